@@ -1,0 +1,42 @@
+// Service control. A service is named "ftpd" (the FTP service as a whole), "ftpd-pure" (the plain FTP
+// daemon), "ftpd-ssl" (the FTPS daemon) or "sftp".
+//
+// Threads: every operation may be called from any thread; a start or stop blocks until it is done.
+#ifndef VELT_PLATFORM_SERVICE_H
+#define VELT_PLATFORM_SERVICE_H
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/// Non-zero when the service is enabled, 0 when it is not.
+int VLIBServiceIsEnabled(const char* service);
+
+/// Starts a daemon. `flags` is 0. Negative on failure.
+int VLIBServicectlStart(const char* service, int flags);
+
+/// Stops a daemon; stopping one that does not run succeeds. `flags` is 0. Negative on failure.
+int VLIBServicectlStop(const char* service, int flags);
+
+/// Sets the service's run key, which decides whether it starts at boot: 1 after it was started, 2
+/// after it was stopped. Negative on failure.
+int VLIBServicecfgRunKeySet(const char* service, int value);
+
+/// Starts a service and marks it enabled. `flags` is 0. Negative on failure.
+int VLIBServiceStart(const char* service, int flags);
+
+/// Stops a service and marks it disabled; stopping one that does not run succeeds. `flags` is 0.
+/// Negative on failure.
+int VLIBServiceStop(const char* service, int flags);
+
+/// Pauses a running service: it takes no new sessions until it is resumed. Negative on failure.
+int VLIBServicePause(const char* service);
+
+/// Resumes a paused service, which takes up the stored settings. Negative on failure.
+int VLIBServiceResume(const char* service);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif
