@@ -1,0 +1,42 @@
+// Every effect of the platform passes here, under a name, so that it can be listed, timed, refused, or
+// failed by a test.
+#ifndef VELT_STANDALONE_CORE_EFFECTS_H
+#define VELT_STANDALONE_CORE_EFFECTS_H
+
+#include <functional>
+#include <string>
+#include <string_view>
+
+namespace velt {
+
+enum class Effect {
+    store,
+    firewall,
+    stop,
+    start,
+    runKey,
+    event,
+    logEntry,
+};
+
+/// The effect's name: "store", "firewall", "stop", "start", "run key", "event", "log".
+std::string_view effectName(Effect effect);
+
+/// Does the effect by calling `act` and returns its result (negative: failed, last error set). `subject` says what
+/// it concerns ("ftp settings", "ftpd", "velt.service.action"). The hook of the calling thread, when there is one, is
+/// asked first.
+int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
+
+/// What a hook decides about one effect: do it, or leave it undone with this result.
+struct EffectDecision {
+    bool doIt = true;
+    int result = 0;
+};
+using EffectHook = std::function<EffectDecision(Effect effect, std::string_view subject)>;
+
+/// Sets the calling thread's hook in place of its former one; an empty function removes it.
+void setEffectHook(EffectHook hook);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,40 @@
+// Files that are whole at every moment, and the lock for changing them.
+#ifndef VELT_STANDALONE_CORE_FILE_STORE_H
+#define VELT_STANDALONE_CORE_FILE_STORE_H
+
+#include <sys/types.h>
+
+#include <filesystem>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace velt {
+
+/// Replaces the file by one with `contents`: temporary file, fsync, rename, fsync of the folder, which is made
+/// when it is missing. After a crash at any moment the old or the new file stands there, whole. Negative
+/// on failure, with the last error set.
+int replaceFile(const std::filesystem::path& path, std::string_view contents, mode_t mode);
+
+/// The whole file; nothing when it cannot be read (errno says why, ENOENT when there is none).
+std::optional<std::string> readFile(const std::filesystem::path& path);
+
+/// Holds the lock of the state root, across threads and processes, while it lives. Read-modify-write
+/// of a stored file happens under it. A thread that holds it may take it again.
+class StateLock {
+public:
+    StateLock();
+    ~StateLock();
+    StateLock(const StateLock&) = delete;
+    StateLock& operator=(const StateLock&) = delete;
+
+    /// False when the lock cannot be had (the last error says why).
+    explicit operator bool() const { return held_; }
+
+private:
+    bool held_ = false;
+};
+
+} // namespace velt
+
+#endif

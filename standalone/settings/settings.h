@@ -1,0 +1,44 @@
+// The stored settings of the services.
+#ifndef VELT_STANDALONE_SETTINGS_SETTINGS_H
+#define VELT_STANDALONE_SETTINGS_SETTINGS_H
+
+#include "ftp/ftp_library.h"
+
+#include <optional>
+#include <string>
+
+namespace velt {
+
+/// Everything that the configuration of the FTP daemon follows from.
+struct FtpSettings {
+    _tag_VELT_FTP_CONF_ record{};
+    int timeout = 300; ///< seconds; 0: never
+    bool useUtf8 = true;
+    bool fipsOnly = false;
+    bool ascii = false;
+    bool umask = true;
+    std::string externalAddress; ///< dotted IPv4, or empty
+};
+
+/// What the SFTP daemon's configuration follows from.
+struct SftpSettings {
+    bool enabled = false;
+    int port = 22;
+};
+
+/// The passive range in force without a custom one.
+inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
+
+/// The stored settings, the defaults before the first store; nothing, with the last error set (file and line), when a file
+/// cannot be read or is damaged.
+std::optional<FtpSettings> loadFtpSettings();
+std::optional<SftpSettings> loadSftpSettings();
+
+/// Whether a daemon would take these settings: negative, with the last error's sentence naming the setting, the value and
+/// what is allowed, when it would not. Looks at numbers and texts only, starts nothing.
+int checkFtpSettings(const FtpSettings& settings);
+int checkSftpSettings(const SftpSettings& settings);
+
+} // namespace velt
+
+#endif
