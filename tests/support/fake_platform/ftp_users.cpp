@@ -1,0 +1,75 @@
+// The FTP configuration library: the shares offered to FTP and the chroot users.
+
+#include "ftp/ftp_library.h"
+#include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/fake_platform/handles.h"
+#include "tests/support/fake_platform/lists.h"
+#include "tests/support/fake_platform/text.h"
+
+#include <algorithm>
+
+using fake::arguments;
+using fake::Platform;
+using fake::Verbatim;
+
+namespace {
+
+using Names = std::vector<std::string>;
+
+Verbatim nameOf(const VLIBCSzList* list) {
+    return {Platform::instance().handles().nameOf(list)};
+}
+
+Names containing(const Names& names, const char* substr) {
+    Names found;
+    std::copy_if(names.begin(), names.end(), std::back_inserter(found), [&](const std::string& name) {
+        return substr == nullptr || name.find(substr) != std::string::npos;
+    });
+    return found;
+}
+
+int moveUsers(const char* operation, const VLIBCSzList* list, Names& from, Names& to) {
+    auto& platform = Platform::instance();
+    if (const auto failure = platform.enter(operation, arguments(fake::listContents(list)))) {
+        return *failure;
+    }
+    if (platform.handles().use<fake::ListBlock>(list, operation) == nullptr) {
+        return -1;
+    }
+    for (const std::string& name : fake::textsOf(list, operation)) {
+        std::erase(from, name);
+        if (std::find(to.begin(), to.end(), name) == to.end()) {
+            to.push_back(name);
+        }
+    }
+    return 0;
+}
+
+} // namespace
+
+int VELTFTPShareEnum(VLIBCSzList** list, int selection) {
+    const auto shown = arguments(nameOf(*list), fake::Hex{static_cast<unsigned>(selection)});
+    return fake::enumerate("VELTFTPShareEnum", shown, list, Platform::instance().ftpShares);
+}
+
+int VELTFTPChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain) {
+    const auto shown = arguments(nameOf(*list), source, substr, domain);
+    const auto users = containing(Platform::instance().chrootUsers, substr);
+    return fake::enumerate("VELTFTPChrootUserEnum", shown, list, users);
+}
+
+int VELTFTPNonChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain) {
+    const auto shown = arguments(nameOf(*list), source, substr, domain);
+    const auto users = containing(Platform::instance().nonChrootUsers, substr);
+    return fake::enumerate("VELTFTPNonChrootUserEnum", shown, list, users);
+}
+
+int VELTFTPAddChrootUser(VLIBCSzList* list) {
+    auto& platform = Platform::instance();
+    return moveUsers("VELTFTPAddChrootUser", list, platform.nonChrootUsers, platform.chrootUsers);
+}
+
+int VELTFTPDeleteChrootUser(VLIBCSzList* list) {
+    auto& platform = Platform::instance();
+    return moveUsers("VELTFTPDeleteChrootUser", list, platform.chrootUsers, platform.nonChrootUsers);
+}

@@ -1,0 +1,47 @@
+// The web API framework: requests, responses and the port registry.
+
+#include "platform/webapi.h"
+#include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/fake_platform/text.h"
+
+using fake::arguments;
+using fake::Platform;
+
+namespace VELT {
+
+Json::Value APIRequest::GetParam(const std::string& name, const Json::Value& defaultValue) {
+    if (Platform::instance().enter("APIRequest::GetParam", arguments(name, defaultValue))) {
+        return defaultValue;
+    }
+    const Json::Value& params = static_cast<fake::Request*>(this)->params;
+    return name.empty() ? params : params.get(name, defaultValue);
+}
+
+void APIResponse::SetSuccess(const Json::Value& data) {
+    if (!Platform::instance().enter("APIResponse::SetSuccess", arguments(data))) {
+        static_cast<fake::Response*>(this)->answers.push_back({true, 0, data});
+    }
+}
+
+void APIResponse::SetError(int code, const Json::Value& data) {
+    if (!Platform::instance().enter("APIResponse::SetError", arguments(code, data))) {
+        static_cast<fake::Response*>(this)->answers.push_back({false, code, data});
+    }
+}
+
+} // namespace VELT
+
+int WebUtils::IsPortConflict(const char* service, int firstPort, int lastPort) {
+    auto& platform = Platform::instance();
+    const auto shown = arguments(service, firstPort, lastPort);
+    if (const auto failure = platform.enter("WebUtils::IsPortConflict", shown)) {
+        return *failure;
+    }
+    for (const auto& [owner, ports] : platform.takenPorts) {
+        const auto port = ports.lower_bound(firstPort);
+        if (owner != service && port != ports.end() && *port <= lastPort) {
+            return 1;
+        }
+    }
+    return 0;
+}
