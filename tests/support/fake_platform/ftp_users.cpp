@@ -7,6 +7,7 @@
 #include "tests/support/fake_platform/text.h"
 
 #include <algorithm>
+#include <iterator>
 
 using fake::arguments;
 using fake::Platform;

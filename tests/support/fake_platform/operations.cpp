@@ -2,6 +2,8 @@
 
 #include "tests/support/fake_platform/fake_platform.h"
 
+#include <iterator>
+
 namespace fake {
 
 namespace {

@@ -2,13 +2,13 @@
 #include "tests/support/fake_platform/handles.h"
 
 #include <algorithm>
-#include <cstring>
+#include <iterator>
 
 namespace fake {
 
 _tag_VELT_FTP_CONF_ State::defaultConf() {
     _tag_VELT_FTP_CONF_ conf{};
-    std::strcpy(conf.portnum, "21");
+    std::copy_n("21", 3, conf.portnum);
     return conf;
 }
 
