@@ -25,7 +25,7 @@ public:
         if (offset + sizeof(T) > bytes_.size()) {
             throw std::runtime_error("ELF file cut short");
         }
-        T value;
+        T value{};
         std::memcpy(&value, bytes_.data() + offset, sizeof(T));
         return value;
     }

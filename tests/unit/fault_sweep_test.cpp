@@ -30,8 +30,6 @@ const std::set<std::string> tolerated = {"VELTFTPASCIIEnabledGet",
                                          "VLIBServiceIsEnabled",
                                          "VLIBSyseventEmit",
                                          "SDK::User::GetDesc",
-                                         "SDK::User::GetDesc",
-                                         "SDK::User::GetDesc",
                                          "SDK::User::LoadUser"};
 
 // These cannot fail: they release, or are read after a failure alone.

@@ -75,7 +75,7 @@ TEST_P(JsonTypes, OfAnyKeyGetOneAnswer) {
 }
 
 TEST_P(JsonTypes, OfTheParametersAsAWholeGetOneAnswerOrTheLibrarysException) {
-    const bool readsParameters = json(GetParam().params).size() > 0;
+    const bool readsParameters = !json(GetParam().params).empty();
     for (const Json::Value& value : anyValues()) {
         SCOPED_TRACE(value.toStyledString());
         EXPECT_EQ(answers(value), !readsParameters || value.isNull() || value.isObject());

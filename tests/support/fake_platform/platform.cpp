@@ -12,8 +12,7 @@ _tag_VELT_FTP_CONF_ State::defaultConf() {
     return conf;
 }
 
-Platform::Platform() : handles_(std::make_unique<HandleTable>()) {
-}
+Platform::Platform() : handles_(std::make_unique<HandleTable>()) {}
 
 Platform::~Platform() = default;
 
