@@ -1,6 +1,6 @@
-#include "standalone/adminlog/admin_log.h"
-
+// The administrator log: who changed what, when, and from where. A database that several processes write at once.
 #include "platform/adminlog.h"
+
 #include "standalone/adminlog/catalogue.h"
 #include "standalone/adminlog/log_database.h"
 #include "standalone/adminlog/request_actor.h"
@@ -9,6 +9,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/events/event_bus.h"
+#include "standalone/standalone.h"
 #include "standalone/text/plain_text.h"
 
 #include <syslog.h>

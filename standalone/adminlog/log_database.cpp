@@ -48,6 +48,10 @@ constexpr const char* querySql =
     "WHERE (?1 IS NULL OR time >= ?1) AND (?2 IS NULL OR event = ?2) AND (?3 IS NULL OR actor = ?3) "
     "AND (?4 IS NULL OR id < ?4) ORDER BY id DESC LIMIT ?5";
 
+std::int64_t millisecondsOf(std::chrono::system_clock::time_point time) {
+    return std::chrono::floor<std::chrono::milliseconds>(time.time_since_epoch()).count();
+}
+
 int execute(sqlite3* database, const char* sql) {
     return sqlite3_exec(database, sql, nullptr, nullptr, nullptr);
 }
@@ -182,7 +186,7 @@ int LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& rete
 
 int LogDatabase::insert(LogEntry& entry) {
     Statement& insert = statements_->insert;
-    insert.bind(1, entry.time.time_since_epoch().count());
+    insert.bind(1, millisecondsOf(entry.time));
     insert.bind(2, entry.category);
     insert.bind(3, entry.level);
     insert.bind(4, std::int64_t{entry.event});
@@ -203,8 +207,8 @@ int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention
             return result;
     }
     if (retention.maxAgeDays > 0) {
-        const LogTime oldest = newest.time - std::chrono::days(retention.maxAgeDays);
-        statements_->removeByAge.bind(1, oldest.time_since_epoch().count());
+        statements_->removeByAge.bind(1,
+                                      millisecondsOf(newest.time - std::chrono::days(retention.maxAgeDays)));
         return statements_->removeByAge.run();
     }
     return SQLITE_DONE;
@@ -212,8 +216,7 @@ int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention
 
 std::optional<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
     Statement& query = statements_->query;
-    query.bind(1, filter.since ? std::optional(std::int64_t{filter.since->time_since_epoch().count()})
-                               : std::nullopt);
+    query.bind(1, filter.since ? std::optional(millisecondsOf(*filter.since)) : std::nullopt);
     query.bind(2, filter.event ? std::optional(std::int64_t{*filter.event}) : std::nullopt);
     query.bind(3, filter.actor);
     query.bind(4, filter.beforeId);
@@ -223,10 +226,10 @@ std::optional<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter)
     for (; result == SQLITE_ROW; result = query.step()) {
         LogEntry& entry = entries.emplace_back();
         entry.id = query.number(0);
-        entry.time = LogTime(std::chrono::milliseconds(query.number(1)));
+        entry.time = std::chrono::system_clock::time_point(std::chrono::milliseconds(query.number(1)));
         entry.category = static_cast<int>(query.number(2));
         entry.level = static_cast<int>(query.number(3));
-        entry.event = static_cast<std::uint32_t>(query.number(4));
+        entry.event = static_cast<unsigned>(query.number(4));
         for (int i = 0; i < 4; ++i)
             entry.texts[static_cast<std::size_t>(i)] = query.text(5 + i);
         entry.sentence = query.text(9);

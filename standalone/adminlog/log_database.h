@@ -2,9 +2,9 @@
 #ifndef VELT_STANDALONE_ADMINLOG_LOG_DATABASE_H
 #define VELT_STANDALONE_ADMINLOG_LOG_DATABASE_H
 
-#include "standalone/adminlog/admin_log.h"
 #include "standalone/adminlog/log_retention.h"
 #include "standalone/adminlog/statement.h"
+#include "standalone/standalone.h"
 
 #include <sys/types.h>
 

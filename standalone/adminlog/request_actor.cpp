@@ -1,6 +1,6 @@
 #include "standalone/adminlog/request_actor.h"
 
-#include <utility>
+#include "standalone/standalone.h"
 
 namespace velt {
 
@@ -13,8 +13,8 @@ RequestActor& threadActor() {
 
 } // namespace
 
-void setRequestActor(std::string actor, std::string address) {
-    threadActor() = {std::move(actor), std::move(address)};
+void setRequestActor(const std::string& actor, const std::string& address) {
+    threadActor() = {actor, address};
 }
 
 const RequestActor& requestActor() {

@@ -1,4 +1,4 @@
-// On whose behalf the calling thread works.
+// On whose behalf the calling thread works, as setRequestActor told.
 #ifndef VELT_STANDALONE_ADMINLOG_REQUEST_ACTOR_H
 #define VELT_STANDALONE_ADMINLOG_REQUEST_ACTOR_H
 
@@ -10,9 +10,6 @@ struct RequestActor {
     std::string actor;
     std::string address;
 };
-
-/// Says who asked for what the calling thread does from now on, and from where; "" and "" when the request is done.
-void setRequestActor(std::string actor, std::string address);
 
 const RequestActor& requestActor();
 

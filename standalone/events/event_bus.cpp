@@ -12,96 +12,96 @@ namespace velt {
 
 namespace {
 
-std::atomic<int> nextSubscription{1};
+std::atomic<Subscription> nextSubscription{1};
 
-/// A subscription keeps a lock of its own, held during its calls: ending it waits for a running call, and a listener
+/// A subscription keeps a lock of its own, held during its calls: ending it waits for a running call, and a subscriber
 /// that ends its own subscription, or causes a further message, does not wait for itself.
-template<class Message> class Listeners {
+template<class Message> class Subscribers {
 public:
-    int add(std::function<void(const Message&)> call) {
-        auto listener = std::make_shared<Listener>();
-        listener->call = std::move(call);
-        const int subscription = nextSubscription++;
+    Subscription add(std::function<void(const Message&)> call) {
+        auto subscriber = std::make_shared<Subscriber>();
+        subscriber->call = std::move(call);
+        const Subscription subscription = nextSubscription++;
         const std::lock_guard lock(mutex_);
-        listeners_.emplace(subscription, std::move(listener));
+        subscribers_.emplace(subscription, std::move(subscriber));
         return subscription;
     }
 
-    void remove(int subscription) {
-        std::shared_ptr<Listener> listener;
+    void remove(Subscription subscription) {
+        std::shared_ptr<Subscriber> subscriber;
         {
             const std::lock_guard lock(mutex_);
-            const auto found = listeners_.find(subscription);
-            if (found == listeners_.end())
+            const auto found = subscribers_.find(subscription);
+            if (found == subscribers_.end())
                 return;
-            listener = std::move(found->second);
-            listeners_.erase(found);
+            subscriber = std::move(found->second);
+            subscribers_.erase(found);
         }
-        const std::lock_guard lock(listener->mutex);
-        listener->ended = true;
+        const std::lock_guard lock(subscriber->mutex);
+        subscriber->ended = true;
     }
 
     void tell(const Message& message) {
-        std::map<int, std::shared_ptr<Listener>> listeners;
+        std::map<Subscription, std::shared_ptr<Subscriber>> subscribers;
         {
             const std::lock_guard lock(mutex_);
-            listeners = listeners_;
+            subscribers = subscribers_;
         }
-        for (const auto& [subscription, listener] : listeners) {
-            const std::lock_guard lock(listener->mutex);
-            if (!listener->ended)
-                call(*listener, message);
+        for (const auto& [subscription, subscriber] : subscribers) {
+            const std::lock_guard lock(subscriber->mutex);
+            if (!subscriber->ended)
+                call(*subscriber, message);
         }
     }
 
 private:
-    struct Listener {
+    struct Subscriber {
         std::recursive_mutex mutex;
         bool ended = false;
         std::function<void(const Message&)> call;
     };
 
-    // What happened has happened, whatever a listener makes of it.
-    static void call(const Listener& listener, const Message& message) {
+    // What happened has happened, whatever a subscriber makes of it.
+    static void call(const Subscriber& subscriber, const Message& message) {
         try {
-            listener.call(message);
+            subscriber.call(message);
         } catch (const std::exception& error) {
-            syslog(LOG_WARNING, "a listener failed: %s", error.what());
+            syslog(LOG_WARNING, "a subscriber failed: %s", error.what());
         } catch (...) {
-            syslog(LOG_WARNING, "a listener failed");
+            syslog(LOG_WARNING, "a subscriber failed");
         }
     }
 
     std::mutex mutex_;
-    std::map<int, std::shared_ptr<Listener>> listeners_;
+    std::map<Subscription, std::shared_ptr<Subscriber>> subscribers_;
 };
 
-template<class Message> Listeners<Message>& listeners() {
-    static Listeners<Message> instance;
+template<class Message> Subscribers<Message>& subscribers() {
+    static Subscribers<Message> instance;
     return instance;
 }
 
 } // namespace
 
-int subscribeEvents(std::function<void(const SystemEvent&)> listener) {
-    return listeners<SystemEvent>().add(std::move(listener));
+Subscription subscribeEvents(EventSubscriber subscriber) {
+    return subscribers<SystemEvent>().add(std::move(subscriber));
 }
 
-int subscribeLog(std::function<void(const LogEntry&)> listener) {
-    return listeners<LogEntry>().add(std::move(listener));
+Subscription subscribeLog(LogSubscriber subscriber) {
+    return subscribers<LogEntry>().add(std::move(subscriber));
 }
 
-void unsubscribe(int subscription) {
-    listeners<SystemEvent>().remove(subscription);
-    listeners<LogEntry>().remove(subscription);
+void unsubscribe(Subscription subscription) {
+    subscribers<SystemEvent>().remove(subscription);
+    subscribers<LogEntry>().remove(subscription);
 }
 
 void publish(const SystemEvent& event) {
-    listeners<SystemEvent>().tell(event);
+    subscribers<SystemEvent>().tell(event);
 }
 
 void publish(const LogEntry& entry) {
-    listeners<LogEntry>().tell(entry);
+    subscribers<LogEntry>().tell(entry);
 }
 
 } // namespace velt

@@ -21,7 +21,7 @@ namespace {
 constexpr std::size_t longestLine = 65536;
 
 /// "2026-11-21T06:30:11.123Z"
-std::string renderTime(LogTime time) {
+std::string renderTime(std::chrono::system_clock::time_point time) {
     const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
     const std::time_t clock = seconds.time_since_epoch().count();
     std::tm parts{};
@@ -29,7 +29,8 @@ std::string renderTime(LogTime time) {
     char date[32];
     std::strftime(date, sizeof date, "%Y-%m-%dT%H:%M:%S", &parts);
     char text[48];
-    std::snprintf(text, sizeof text, "%s.%03dZ", date, static_cast<int>((time - seconds).count()));
+    std::snprintf(text, sizeof text, "%s.%03dZ", date,
+                  static_cast<int>(std::chrono::floor<std::chrono::milliseconds>(time - seconds).count()));
     return text;
 }
 

@@ -2,7 +2,7 @@
 #ifndef VELT_STANDALONE_EVENTS_EVENT_FILE_H
 #define VELT_STANDALONE_EVENTS_EVENT_FILE_H
 
-#include "standalone/events/event_bus.h"
+#include "standalone/standalone.h"
 
 #include <string>
 

@@ -22,7 +22,7 @@ int VLIBSyseventEmit(const char* event, VLIBCSzHash* params, int /*flags*/) {
         announced.actor = velt::requestActor().actor;
         announced.address = velt::requestActor().address;
         return velt::perform(velt::Effect::event, announced.name, [&announced] {
-            // Listeners hear of it even when the file cannot take it: it is not undone by that.
+            // Subscribers hear of it even when the file cannot take it: it is not undone by that.
             const int written = velt::appendEvent(announced);
             velt::publish(announced);
             return written;

@@ -1,12 +1,9 @@
-#include "standalone/adminlog/admin_log.h"
-
 #include "platform/adminlog.h"
 #include "platform/core.h"
-#include "standalone/adminlog/request_actor.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/events/event_bus.h"
+#include "standalone/standalone.h"
 #include "standalone/text/plain_text.h"
 #include "tests/standalone/support/temporary_folder.h"
 
@@ -170,9 +167,9 @@ TEST_F(AdminLogTest, IsReadableByItsOwnerAlone) {
     }
 }
 
-TEST_F(AdminLogTest, TellsListenersOnceTheEntryIsStored) {
+TEST_F(AdminLogTest, TellsSubscribersOnceTheEntryIsStored) {
     std::vector<std::string> heard;
-    const int subscription = subscribeLog([&heard](const LogEntry& entry) {
+    const Subscription subscription = subscribeLog([&heard](const LogEntry& entry) {
         heard.push_back(std::to_string(entry.id) + " " + entry.sentence + " " +
                         std::to_string(queryLog({})->size()));
     });

@@ -1,8 +1,7 @@
 #include "platform/adminlog.h"
-#include "standalone/adminlog/admin_log.h"
-#include "standalone/adminlog/request_actor.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/standalone.h"
 #include "tests/standalone/support/process.h"
 #include "tests/standalone/support/temporary_folder.h"
 

@@ -1,9 +1,9 @@
 #include "standalone/adminlog/log_retention.h"
 
 #include "platform/adminlog.h"
-#include "standalone/adminlog/admin_log.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/standalone.h"
 #include "tests/standalone/support/temporary_folder.h"
 
 #include <gtest/gtest.h>

@@ -18,10 +18,12 @@ SystemEvent eventCalled(const std::string& name) {
 
 using Names = std::vector<std::string>;
 
-TEST(EventBus, TellsEveryListenerInTheOrderOfSubscription) {
+TEST(EventBus, TellsEverySubscriberInTheOrderOfSubscription) {
     Names heard;
-    const int first = subscribeEvents([&](const SystemEvent& event) { heard.push_back("1 " + event.name); });
-    const int second = subscribeEvents([&](const SystemEvent& event) { heard.push_back("2 " + event.name); });
+    const Subscription first =
+        subscribeEvents([&](const SystemEvent& event) { heard.push_back("1 " + event.name); });
+    const Subscription second =
+        subscribeEvents([&](const SystemEvent& event) { heard.push_back("2 " + event.name); });
     EXPECT_NE(first, second);
     publish(eventCalled("a"));
     unsubscribe(first);
@@ -34,8 +36,8 @@ TEST(EventBus, TellsEveryListenerInTheOrderOfSubscription) {
 TEST(EventBus, KeepsEventsAndLogEntriesApart) {
     int events = 0;
     int entries = 0;
-    const int first = subscribeEvents([&](const SystemEvent&) { ++events; });
-    const int second = subscribeLog([&](const LogEntry&) { ++entries; });
+    const Subscription first = subscribeEvents([&](const SystemEvent&) { ++events; });
+    const Subscription second = subscribeLog([&](const LogEntry&) { ++entries; });
     publish(eventCalled("a"));
     publish(LogEntry{});
     publish(LogEntry{});
@@ -45,19 +47,19 @@ TEST(EventBus, KeepsEventsAndLogEntriesApart) {
     EXPECT_EQ(entries, 2);
 }
 
-TEST(EventBus, AListenerThatThrowsHidesNothingFromTheNext) {
+TEST(EventBus, ASubscriberThatThrowsHidesNothingFromTheNext) {
     int heard = 0;
-    const int first = subscribeEvents([](const SystemEvent&) { throw std::runtime_error("no"); });
-    const int second = subscribeEvents([&](const SystemEvent&) { ++heard; });
+    const Subscription first = subscribeEvents([](const SystemEvent&) { throw std::runtime_error("no"); });
+    const Subscription second = subscribeEvents([&](const SystemEvent&) { ++heard; });
     EXPECT_NO_THROW(publish(eventCalled("a")));
     unsubscribe(first);
     unsubscribe(second);
     EXPECT_EQ(heard, 1);
 }
 
-TEST(EventBus, AListenerMayEndItsOwnSubscription) {
+TEST(EventBus, ASubscriberMayEndItsOwnSubscription) {
     int heard = 0;
-    int subscription = 0;
+    Subscription subscription = 0;
     subscription = subscribeEvents([&](const SystemEvent&) {
         ++heard;
         unsubscribe(subscription);
@@ -67,9 +69,9 @@ TEST(EventBus, AListenerMayEndItsOwnSubscription) {
     EXPECT_EQ(heard, 1);
 }
 
-TEST(EventBus, AListenerMayCauseAFurtherEvent) {
+TEST(EventBus, ASubscriberMayCauseAFurtherEvent) {
     Names heard;
-    const int subscription = subscribeEvents([&](const SystemEvent& event) {
+    const Subscription subscription = subscribeEvents([&](const SystemEvent& event) {
         heard.push_back(event.name);
         if (event.name == "a")
             publish(eventCalled("b"));
@@ -80,7 +82,7 @@ TEST(EventBus, AListenerMayCauseAFurtherEvent) {
 }
 
 TEST(EventBus, IgnoresUnknownSubscriptions) {
-    unsubscribe(-1);
+    unsubscribe(0);
     unsubscribe(1'000'000);
 }
 
@@ -93,7 +95,7 @@ TEST(EventBus, NoCallRunsOnceASubscriptionHasEnded) {
     std::atomic<int> late = 0;
     for (int round = 0; round < 300; ++round) {
         std::atomic<bool> ended = false;
-        const int subscription = subscribeEvents([&](const SystemEvent&) {
+        const Subscription subscription = subscribeEvents([&](const SystemEvent&) {
             if (ended)
                 ++late;
         });

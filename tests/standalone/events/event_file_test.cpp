@@ -1,11 +1,10 @@
 #include "platform/core.h"
 #include "platform/sysevent.h"
-#include "standalone/adminlog/request_actor.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/events/event_bus.h"
 #include "standalone/events/event_file.h"
+#include "standalone/standalone.h"
 #include "tests/standalone/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
@@ -79,14 +78,15 @@ TEST_F(EventFileTest, WritesOneObjectALine) {
 
 TEST_F(EventFileTest, RendersTheTimeInUtcWithMilliseconds) {
     SystemEvent event;
-    event.time = LogTime(std::chrono::milliseconds(1'795'242'611'007));
+    event.time = std::chrono::system_clock::time_point(std::chrono::milliseconds(1'795'242'611'007));
     EXPECT_NE(renderEvent(event).find("\"2026-11-21T06:30:11.007Z\""), std::string::npos)
         << renderEvent(event);
 }
 
-TEST_F(EventFileTest, TellsListenersWhatWasAnnounced) {
+TEST_F(EventFileTest, TellsSubscribersWhatWasAnnounced) {
     std::vector<SystemEvent> heard;
-    const int subscription = subscribeEvents([&heard](const SystemEvent& event) { heard.push_back(event); });
+    const Subscription subscription =
+        subscribeEvents([&heard](const SystemEvent& event) { heard.push_back(event); });
     ASSERT_EQ(emit("velt.service.action", {{"SERVICE_NAME", "sftp"}}), 0);
     unsubscribe(subscription);
     ASSERT_EQ(heard.size(), 1U);
@@ -125,7 +125,7 @@ TEST_F(EventFileTest, WhatIsNoUtf8IsReplaced) {
 
 TEST_F(EventFileTest, AnOverlongEventIsRefusedButHeard) {
     int heard = 0;
-    const int subscription = subscribeEvents([&heard](const SystemEvent&) { ++heard; });
+    const Subscription subscription = subscribeEvents([&heard](const SystemEvent&) { ++heard; });
     EXPECT_LT(emit("e", {{"k", std::string(70'000, 'x')}}), 0);
     unsubscribe(subscription);
     EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::event));
@@ -158,7 +158,7 @@ TEST_F(EventFileTest, FollowsARotation) {
 TEST_F(EventFileTest, IsAnEffectThatCanBeLeftUndone) {
     std::string seen;
     int heard = 0;
-    const int subscription = subscribeEvents([&heard](const SystemEvent&) { ++heard; });
+    const Subscription subscription = subscribeEvents([&heard](const SystemEvent&) { ++heard; });
     setEffectHook([&seen](Effect effect, std::string_view subject) {
         seen = std::string(effectName(effect)) + " " + std::string(subject);
         return EffectDecision{false, 0};
