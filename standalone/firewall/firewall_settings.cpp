@@ -5,81 +5,101 @@
 #include "standalone/core/state_root.h"
 #include "standalone/ports/port_range.h"
 
-#include <algorithm>
+#include <array>
 #include <cerrno>
 #include <cstring>
+#include <set>
 #include <sstream>
+#include <utility>
 
 namespace velt {
 namespace {
 
-constexpr std::string_view versionLine = "version 1";
+constexpr std::array<std::pair<std::string_view, FirewallMode>, 3> modes{{
+    {"off", FirewallMode::off},
+    {"accept", FirewallMode::accept},
+    {"drop", FirewallMode::drop},
+}};
 
-/// What is wrong with the line, as the end of a sentence; "" when it was taken.
-std::string takeLine(const std::string& line, FirewallSettings& settings) {
-    std::istringstream words(line);
-    std::string key;
-    words >> key;
-    if (key == "mode") {
-        std::string mode;
-        std::string rest;
-        words >> mode;
-        if (words >> rest || (mode != "off" && mode != "accept" && mode != "drop")) {
-            return "the mode is none of off, accept and drop";
+std::string trimmed(const std::string& text) {
+    constexpr const char* blanks = " \t\r";
+    const auto first = text.find_first_not_of(blanks);
+    return first == std::string::npos ? "" : text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+class Parser {
+public:
+    /// What is wrong with the line, as the end of a sentence; "" when it was taken.
+    std::string take(const std::string& line) {
+        const auto equals = line.find('=');
+        const std::string key = trimmed(line.substr(0, equals));
+        if (equals == std::string::npos || key.empty()) {
+            return "this is no line of the form \"key = value\"";
         }
-        settings.mode = mode == "off"      ? FirewallMode::off
-                        : mode == "accept" ? FirewallMode::accept
-                                           : FirewallMode::drop;
+        if (!seen_.insert(key).second) {
+            return "the key " + key + " stands there a second time";
+        }
+        const std::string value = trimmed(line.substr(equals + 1));
+        if (key == "version") {
+            return value == "1" ? "" : "version \"" + value + "\" is not known here";
+        }
+        if (key == "mode") {
+            return takeMode(value);
+        }
+        return key == "ports" ? takePorts(value) : "the key " + key + " is not known";
+    }
+
+    bool hasVersion() const { return seen_.count("version") > 0; }
+    const FirewallSettings& settings() const { return settings_; }
+
+private:
+    std::string takeMode(const std::string& value) {
+        for (const auto& [name, mode] : modes) {
+            if (name == value) {
+                settings_.mode = mode;
+                return "";
+            }
+        }
+        return "the mode is none of off, accept and drop";
+    }
+
+    std::string takePorts(const std::string& value) {
+        std::istringstream words(value);
+        for (std::string word; words >> word;) {
+            const auto range = parsePortRange(word);
+            if (!range) {
+                return "\"" + word + "\" is neither a port nor a range of ports";
+            }
+            settings_.furtherPorts.push_back(*range);
+        }
         return "";
     }
-    if (key != "ports") {
-        return "the key \"" + key + "\" is unknown";
-    }
-    for (std::string word; words >> word;) {
-        const auto range = parsePortRange(word);
-        if (!range) {
-            return "\"" + word + "\" is neither a port nor a range of ports";
-        }
-        settings.furtherPorts.push_back(*range);
-    }
-    return "";
-}
+
+    std::set<std::string> seen_;
+    FirewallSettings settings_;
+};
 
 } // namespace
 
 std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, const std::string& file) {
-    FirewallSettings settings;
-    bool versionSeen = false;
+    Parser parser;
     int number = 0;
-    const auto damaged = [&](const std::string& what) {
-        fail(ErrorNumber::damaged, file + ", line " + std::to_string(number) + ": " + what + ".");
-        return std::nullopt;
-    };
+    std::string problem;
     std::istringstream lines{std::string(text)};
-    for (std::string line; std::getline(lines, line);) {
+    for (std::string line; problem.empty() && std::getline(lines, line);) {
         ++number;
-        line.erase(std::min(line.find('#'), line.size()));
-        line.erase(line.find_last_not_of(" \t\r") + 1);
-        if (line.empty()) {
-            continue;
-        }
-        if (!versionSeen) {
-            if (line != versionLine) {
-                return damaged("the file does not begin with \"" + std::string(versionLine) + "\"");
-            }
-            versionSeen = true;
-            continue;
-        }
-        const std::string problem = takeLine(line, settings);
-        if (!problem.empty()) {
-            return damaged(problem);
-        }
+        line = trimmed(line.substr(0, line.find('#')));
+        problem = line.empty() ? "" : parser.take(line);
     }
-    if (!versionSeen) {
-        number = 1;
-        return damaged("the file does not begin with \"" + std::string(versionLine) + "\"");
+    if (problem.empty() && !parser.hasVersion()) {
+        problem = "the key version is missing";
     }
-    return settings;
+    if (!problem.empty()) {
+        fail(ErrorNumber::damaged,
+             "Settings file " + file + ", line " + std::to_string(number) + ": " + problem + ".");
+        return std::nullopt;
+    }
+    return parser.settings();
 }
 
 std::optional<FirewallSettings> loadFirewallSettings() {
@@ -90,7 +110,8 @@ std::optional<FirewallSettings> loadFirewallSettings() {
         return parseFirewallSettings(*text, file.string());
     }
     if (errno != ENOENT) {
-        fail(ErrorNumber::store, file.string() + " cannot be read: " + std::strerror(errno) + ".");
+        fail(ErrorNumber::store,
+             "Settings file " + file.string() + " cannot be read: " + std::strerror(errno) + ".");
         return std::nullopt;
     }
     return FirewallSettings{};

@@ -24,9 +24,9 @@ struct FirewallSettings {
 
 /// Reads the text of the settings' file:
 ///
-///     version 1
-///     mode drop
-///     ports 22 443 8000-8010
+///     version = 1
+///     mode = drop
+///     ports = 22 443 8000-8010
 ///
 /// `file` names it in errors. Nothing, with the last error naming file and line, when it does not have this form.
 std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, const std::string& file);

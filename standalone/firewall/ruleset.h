@@ -16,7 +16,8 @@ std::vector<VELT_FTP_PORT_RANGE> servicePorts(const FtpSettings& ftp, const Sftp
 
 /// A script that replaces our table, or in mode off removes it, whether there is one before or not. nft carries it out as a
 /// whole or not at all.
-std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& servicePorts);
+std::string renderRuleset(const FirewallSettings& settings,
+                          const std::vector<VELT_FTP_PORT_RANGE>& servicePorts);
 
 } // namespace velt
 

@@ -26,8 +26,9 @@ std::optional<std::vector<KnownService>> parseKnownServices(std::string_view tex
         }
         const auto range = parsePortRange(ports);
         if (!range || !(words >> name) || words >> rest) {
-            fail(ErrorNumber::damaged, file + ", line " + std::to_string(number) +
-                                           ": this is not a port, or a range of ports, and a service's name.");
+            fail(ErrorNumber::damaged,
+                 "Settings file " + file + ", line " + std::to_string(number) +
+                     ": this is not a port, or a range of ports, and a service's name.");
             return std::nullopt;
         }
         services.push_back({range->first, range->last, name});
@@ -43,10 +44,11 @@ std::optional<std::vector<KnownService>> loadKnownServices() {
         return parseKnownServices(*text, file.string());
     }
     if (errno != ENOENT) {
-        fail(ErrorNumber::store, file.string() + " cannot be read: " + std::strerror(errno) + ".");
+        fail(ErrorNumber::store,
+             "Settings file " + file.string() + " cannot be read: " + std::strerror(errno) + ".");
         return std::nullopt;
     }
-    return parseKnownServices(shippedKnownServices, "the shipped list of known services");
+    return parseKnownServices(shippedKnownServices, "known_services.conf, as shipped");
 }
 
 } // namespace velt

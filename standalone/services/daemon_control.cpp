@@ -46,7 +46,8 @@ public:
         while (descriptor_ && (result = ::flock(descriptor_.get(), LOCK_EX)) != 0 && errno == EINTR) {
         }
         if (result != 0) {
-            fail(ErrorNumber::store, "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
+            fail(ErrorNumber::store,
+                 "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
         }
         held_ = result == 0;
     }

@@ -34,7 +34,8 @@ int affect(Effect effect, const char* service, const std::function<int(Daemon)>&
 int setRunKey(const char* service, int value) {
     return affect(Effect::runKey, service, [service, value](Daemon) {
         if (value != keyAfterStart && value != keyAfterStop) {
-            return fail(ErrorNumber::invalid, "The run key " + std::to_string(value) + " is neither 1 nor 2.");
+            return fail(ErrorNumber::invalid,
+                        "The run key " + std::to_string(value) + " is neither 1 nor 2.");
         }
         return replaceFile(statePath("/etc/velt/run-keys") / service, std::to_string(value) + "\n", 0644);
     });
@@ -133,8 +134,8 @@ int VLIBServiceResume(const char* service) {
 }
 
 int VELTSFTPIsAlive(void) {
-    const int alive = velt::atBoundary(
-        [] { return velt::isServing(velt::daemonState(velt::Daemon::sftp)) ? 1 : 0; });
+    const int alive =
+        velt::atBoundary([] { return velt::isServing(velt::daemonState(velt::Daemon::sftp)) ? 1 : 0; });
     return alive > 0 ? 1 : 0;
 }
 

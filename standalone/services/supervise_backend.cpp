@@ -131,8 +131,7 @@ int SuperviseBackend::start(const DaemonPlan& plan) {
     if (!supervised) {
         return launchSupervisor(directory, plan);
     }
-    const ControlRequest request{Command::start,
-                                 {plan.configurationHash, plan.listenPorts, plan.arguments}};
+    const ControlRequest request{Command::start, {plan.configurationHash, plan.listenPorts, plan.arguments}};
     const auto answer = askSupervisor(directory, daemon_, request, answerLimit);
     if (!answer) {
         return failToStart("its supervisor, process " + std::to_string(now.supervisor.pid) +

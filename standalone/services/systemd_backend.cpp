@@ -72,7 +72,8 @@ int SystemdBackend::start(const DaemonPlan& plan) {
     if (probePorts(plan.listenPorts, now.daemon.pid) < 0 || writeUnit(plan) < 0) {
         return -1;
     }
-    const ProcessResult started = runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
+    const ProcessResult started =
+        runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
     if (started.exitCode != 0) {
         return failedToStart(daemon_, oneLine(started.errors));
     }
@@ -106,9 +107,9 @@ int SystemdBackend::waitUntilServing() const {
 }
 
 std::string SystemdBackend::lastLines() const {
-    return oneLine(
-        runProcess({places_.journalctl, "--unit=" + unitName(daemon_), "--lines=5", "--output=cat", "--no-pager"})
-            .output);
+    return oneLine(runProcess({places_.journalctl, "--unit=" + unitName(daemon_), "--lines=5", "--output=cat",
+                               "--no-pager"})
+                       .output);
 }
 
 int SystemdBackend::endListener() const {
