@@ -8,6 +8,7 @@
 #include "standalone/ports/port_range.h"
 #include "standalone/services/services.h"
 #include "standalone/settings/settings.h"
+#include "standalone/standalone.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -23,7 +24,13 @@ constexpr std::string_view ftpService = "ftp";
 constexpr std::string_view sftpService = "ssh";
 constexpr int highestPort = 65535;
 
-thread_local std::string holder;
+/// A port that the service cannot have. What is wrong with the numbers alone has no holder.
+struct Conflict {
+    PortConflict found;
+    std::string sentence;
+};
+
+thread_local PortConflict lastConflict;
 
 /// The ports that belong to a service of ours by the stored settings.
 struct ConfiguredPorts {
@@ -50,8 +57,8 @@ int firstCommonPort(const VELT_FTP_PORT_RANGE& one, const VELT_FTP_PORT_RANGE& o
     return first <= std::min(one.last, other.last) ? first : 0;
 }
 
-std::string portName(int port) {
-    return "Port " + std::to_string(port);
+Conflict heldBy(int port, const std::string& holder) {
+    return {{port, holder}, "Port " + std::to_string(port) + " is taken by " + holder + "."};
 }
 
 std::optional<ConfiguredPorts> loadConfiguredPorts() {
@@ -63,35 +70,35 @@ std::optional<ConfiguredPorts> loadConfiguredPorts() {
     return ConfiguredPorts{std::atoi(ftp->record.portnum), passiveRangeOf(ftp->record), sftp->port};
 }
 
-/// What is wrong with the numbers themselves; "" when nothing is. Like the following: a sentence.
-std::string conflictOfForm(const Question& question) {
-    const auto& [first, last] = question.range;
-    for (const int port : {first, last}) {
+std::optional<Conflict> conflictOfForm(const Question& question) {
+    const VELT_FTP_PORT_RANGE& range = question.range;
+    for (const int port : {range.first, range.last}) {
         if (port < 1 || port > highestPort) {
-            return "The port " + std::to_string(port) + " is not one from 1 to " +
-                   std::to_string(highestPort) + ".";
+            return Conflict{{port, ""},
+                            "The port " + std::to_string(port) + " is not one from 1 to " +
+                                std::to_string(highestPort) + "."};
         }
     }
-    if (first > last) {
-        return "The range " + formatPortRange(question.range) + " is upside down.";
+    if (range.first > range.last) {
+        return Conflict{{range.first, ""}, "The range " + formatPortRange(range) + " is upside down."};
     }
-    return "";
+    return std::nullopt;
 }
 
-std::string conflictWithConfiguration(const Question& question, const ConfiguredPorts& ports) {
+std::optional<Conflict> conflictWithConfiguration(const Question& question, const ConfiguredPorts& ports) {
     if (question.service != sftpService && question.holds(ports.sftp)) {
-        return portName(ports.sftp) + " is the port of the SFTP service.";
+        return heldBy(ports.sftp, "the SFTP service");
     }
     // A single port may be asked for by the FTP service since it is its control port; a range may not hold it.
     if (!(question.service == ftpService && question.isOnePort()) && question.holds(ports.ftpControl)) {
-        return portName(ports.ftpControl) + " is the control port of the FTP service.";
+        return heldBy(ports.ftpControl, "the control connections of the FTP service");
     }
     const int passive = firstCommonPort(question.range, ports.ftpPassive);
     if (question.service != ftpService && passive != 0) {
-        return portName(passive) + " is in the passive range " + formatPortRange(ports.ftpPassive) +
-               " of the FTP service.";
+        return heldBy(passive,
+                      "the passive range " + formatPortRange(ports.ftpPassive) + " of the FTP service");
     }
-    return "";
+    return std::nullopt;
 }
 
 /// Whether the asking service has the port already, so that nobody else is asked about it.
@@ -105,13 +112,9 @@ bool isOwnPort(const Question& question, const ConfiguredPorts& ports, int port)
     return question.isOnePort() ? port == ports.ftpControl : contains(ports.ftpPassive, port);
 }
 
-/// Nothing, with the last error set, when the list of known services cannot be read.
-std::optional<std::string> conflictWithKnownService(const Question& question, const ConfiguredPorts& ports) {
-    const auto services = loadKnownServices();
-    if (!services) {
-        return std::nullopt;
-    }
-    for (const KnownService& service : *services) {
+std::optional<Conflict> conflictWithKnownService(const Question& question, const ConfiguredPorts& ports,
+                                                 const std::vector<KnownService>& services) {
+    for (const KnownService& service : services) {
         if (service.name == question.service) {
             continue;
         }
@@ -119,11 +122,11 @@ std::optional<std::string> conflictWithKnownService(const Question& question, co
         const int last = std::min(question.range.last, service.lastPort);
         for (int port = first; port != 0 && port <= last; ++port) {
             if (!isOwnPort(question, ports, port)) {
-                return portName(port) + " is kept for the service " + service.name + ".";
+                return heldBy(port, "the service " + service.name + " of this server");
             }
         }
     }
-    return "";
+    return std::nullopt;
 }
 
 /// The daemon of the asking service and its sessions, some of which listen on passive ports.
@@ -138,13 +141,13 @@ std::vector<ProcessId> ownProcesses(const Question& question) {
     return livingTrees(roots);
 }
 
-std::string conflictWithListener(const Question& question, const ConfiguredPorts& ports) {
+std::optional<Conflict> conflictWithListener(const Question& question, const ConfiguredPorts& ports) {
     std::vector<ListeningSocket> sockets = listeningSockets();
     std::erase_if(sockets, [&](const ListeningSocket& socket) {
         return !question.holds(socket.port) || isOwnPort(question, ports, socket.port);
     });
     if (sockets.empty()) {
-        return "";
+        return std::nullopt;
     }
     const auto owners = ownersOf(sockets);
     std::set<pid_t> own;
@@ -155,37 +158,44 @@ std::string conflictWithListener(const Question& question, const ConfiguredPorts
         const auto owner = owners.find(socket.inode);
         const SocketOwner found = owner == owners.end() ? SocketOwner{} : owner->second;
         if (own.count(found.pid) == 0) {
-            return portName(socket.port) + " is in use by " + describeOwner(found) + ".";
+            return heldBy(socket.port, describeOwner(found));
         }
     }
-    return "";
+    return std::nullopt;
 }
 
-/// The first conflict as a sentence, "" when there is none; nothing, with the last error set, when it cannot be found out.
-std::optional<std::string> findConflict(const Question& question) {
-    std::string conflict = conflictOfForm(question);
-    if (!conflict.empty()) {
-        return conflict;
+/// 0 when there is none; else negative, with the last error set and the conflict remembered.
+int findConflict(const Question& question) {
+    const auto report = [](const Conflict& conflict) {
+        lastConflict = conflict.found;
+        return fail(ErrorNumber::portTaken, conflict.sentence);
+    };
+    if (const auto conflict = conflictOfForm(question)) {
+        return report(*conflict);
     }
     const auto ports = loadConfiguredPorts();
-    if (!ports) {
-        return std::nullopt;
+    const auto services = loadKnownServices();
+    if (!ports || !services) {
+        return -1; // a question that cannot be answered is no permission to take the port
     }
-    conflict = conflictWithConfiguration(question, *ports);
-    if (!conflict.empty()) {
-        return conflict;
+    if (const auto conflict = conflictWithConfiguration(question, *ports)) {
+        return report(*conflict);
     }
-    auto known = conflictWithKnownService(question, *ports);
-    if (!known || !known->empty()) {
-        return known;
+    if (const auto conflict = conflictWithKnownService(question, *ports, *services)) {
+        return report(*conflict);
     }
-    return conflictWithListener(question, *ports);
+    const auto conflict = conflictWithListener(question, *ports);
+    return conflict ? report(*conflict) : 0;
 }
 
 } // namespace
 
 const std::string& lastPortHolder() {
-    return holder;
+    return lastConflict.holder;
+}
+
+PortConflict lastPortConflict() {
+    return lastConflict;
 }
 
 } // namespace velt
@@ -193,20 +203,11 @@ const std::string& lastPortHolder() {
 namespace WebUtils {
 
 int IsPortConflict(const char* service, int firstPort, int lastPort) {
-    velt::holder.clear();
+    velt::lastConflict = {};
     const int result = velt::atBoundary([&] {
-        const auto conflict = velt::findConflict({service == nullptr ? "" : service, {firstPort, lastPort}});
-        if (!conflict) {
-            return -1;
-        }
-        velt::holder = *conflict;
-        return conflict->empty() ? 0 : velt::fail(velt::ErrorNumber::portTaken, *conflict);
+        return velt::findConflict({service == nullptr ? "" : service, {firstPort, lastPort}});
     });
-    // A question that cannot be answered is no permission to take the port.
-    if (result < 0 && velt::holder.empty()) {
-        velt::holder = velt::lastErrorSentence();
-    }
-    return result == 0 ? 0 : 1;
+    return result < 0 ? 1 : 0;
 }
 
 } // namespace WebUtils

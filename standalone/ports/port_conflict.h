@@ -6,8 +6,9 @@
 
 namespace velt {
 
-/// Why the calling thread's last WebUtils::IsPortConflict answered that there is a conflict, as one sentence that names the
-/// port and who holds it; "" when there was none.
+/// Who holds the port of the calling thread's last WebUtils::IsPortConflict, in words ("nginx (process 812)"); "" when there was no
+/// conflict, or when the numbers themselves were wrong. The last error has the whole sentence, and lastPortConflict
+/// (standalone/standalone.h) the port as well.
 const std::string& lastPortHolder();
 
 } // namespace velt

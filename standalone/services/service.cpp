@@ -10,6 +10,7 @@
 #include "standalone/services/daemon_control.h"
 #include "standalone/services/services.h"
 #include "standalone/settings/settings.h"
+#include "standalone/standalone.h"
 
 #include <syslog.h>
 
@@ -64,7 +65,7 @@ int startEnabledServices() {
         if (!ftp || !sftp) {
             return -1;
         }
-        // Rules that miss do not keep the services down, just as they do not when a port changes.
+        // The firewall's rules went with the boot as well. Rules that miss do not keep the services down, just as they do not when a port changes.
         if (VELTFwRuleHup() < 0) {
             ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
         }

@@ -1,4 +1,4 @@
-// The services beyond what the contract says about them.
+// What runs, for the other parts of the platform.
 #ifndef VELT_STANDALONE_SERVICES_SERVICES_H
 #define VELT_STANDALONE_SERVICES_SERVICES_H
 
@@ -7,11 +7,6 @@
 #include <string>
 
 namespace velt {
-
-/// For the time after a boot: loads the firewall's rules, starts every daemon that the stored settings enable and stops those
-/// that they do not. Negative when a daemon failed, with the last error of the last one that did; the others were
-/// started all the same. Rules that cannot be loaded are written to the system log.
-int startEnabledServices();
 
 /// What runs of the service: "ftpd", "ftpd-pure" and "ftpd-ssl" are one daemon, "sftp" is the other. Stopped for an unknown
 /// name.

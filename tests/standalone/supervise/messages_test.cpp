@@ -44,8 +44,8 @@ protected:
 };
 
 TEST_F(StateFile, ComesBackAsItWasWritten) {
-    const ServiceState state{
-        RunState::failed, {10, 100}, {11, 110}, "a hash", {21, 22}, {{12, 120}, {13, 130}}, "two\nlines"};
+    const ServiceState state{RunState::failed,       {10, 100},   {11, 110}, "a hash", {21, 22},
+                             {{12, 120}, {13, 130}}, "two\nlines"};
     ASSERT_TRUE(writeServiceState(file_, state));
     const auto read = readServiceState(file_);
     ASSERT_TRUE(read);

@@ -140,7 +140,8 @@ TEST_F(SupervisorTest, ADaemonThatKeepsDyingIsStartedLessAndLessOften) {
     EXPECT_GE(seen.size(), 3U);
     EXPECT_LE(seen.size(), 6U);
     ASSERT_TRUE(waitUntil([this] { return backend_.state().state == RunState::failed; }, seconds(4)));
-    EXPECT_NE(backend_.state().reason.find("lived long enough"), std::string::npos) << backend_.state().reason;
+    EXPECT_NE(backend_.state().reason.find("lived long enough"), std::string::npos)
+        << backend_.state().reason;
 }
 
 TEST_F(SupervisorTest, APauseEndsTheListenerAndLeavesTheSessions) {
@@ -278,7 +279,8 @@ TEST_F(SupervisorTest, ASupervisorThatIsAskedToEndTakesItsDaemonAlong) {
     start();
     const ServiceState before = backend_.state();
     signalProcess(before.supervisor, SIGTERM);
-    EXPECT_TRUE(waitUntil([&] { return !isAlive(before.supervisor) && !isAlive(before.daemon); }, seconds(3)));
+    EXPECT_TRUE(
+        waitUntil([&] { return !isAlive(before.supervisor) && !isAlive(before.daemon); }, seconds(3)));
     EXPECT_FALSE(accepts(port_));
 }
 
