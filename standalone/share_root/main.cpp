@@ -4,6 +4,7 @@
 // that daemon. The server's own mount table stays as it is, and everything is gone when the daemon has ended.
 //
 // LIST has one line per share: "ro" or "rw", the place below FOLDER, and the share's folder, separated by tabs.
+#include <fcntl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -62,12 +63,14 @@ void mountShare(const std::string& root, const Place& place) {
     if (mount(place.folder.c_str(), target.c_str(), nullptr, MS_BIND | MS_REC, nullptr) < 0) {
         giveUp("mount " + place.folder);
     }
-    unsigned long flags = MS_REMOUNT | MS_BIND | MS_NOSUID | MS_NODEV;
+    // Adds to what the server's own mounts are restricted by already; a plain remount would lift that.
+    mount_attr attributes{};
+    attributes.attr_set = MOUNT_ATTR_NOSUID | MOUNT_ATTR_NODEV;
     if (place.readOnly) {
-        flags |= MS_RDONLY;
+        attributes.attr_set |= MOUNT_ATTR_RDONLY;
     }
-    if (mount(nullptr, target.c_str(), nullptr, flags, nullptr) < 0) {
-        giveUp("remount " + place.folder);
+    if (mount_setattr(AT_FDCWD, target.c_str(), AT_RECURSIVE, &attributes, sizeof attributes) < 0) {
+        giveUp("restrict " + place.folder);
     }
 }
 
