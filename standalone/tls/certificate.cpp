@@ -71,10 +71,16 @@ std::optional<ServerCertificate> load(const Pair& pair) {
                              sha256(*certificateText + *keyText)};
 }
 
-bool isCurrent(const Pair& pair) {
-    const auto text = readFile(pair.certificate);
-    const CertificateOwner certificate = text ? parseCertificate(*text) : nullptr;
-    return certificate && X509_cmp_current_time(X509_get0_notAfter(certificate.get())) > 0;
+// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good here too.
+bool isUsable(const Pair& pair) {
+    const auto certificateText = readFile(pair.certificate);
+    const auto keyText = readFile(pair.key);
+    const CertificateOwner certificate = certificateText ? parseCertificate(*certificateText) : nullptr;
+    const KeyOwner key = keyText ? parseKey(*keyText) : nullptr;
+    const bool usable = certificate && key && X509_check_private_key(certificate.get(), key.get()) == 1 &&
+                        X509_cmp_current_time(X509_get0_notAfter(certificate.get())) > 0;
+    ERR_clear_error();
+    return usable;
 }
 
 int makeOwn(const Pair& pair) {
@@ -83,14 +89,13 @@ int makeOwn(const Pair& pair) {
         ERR_clear_error();
         return fail(ErrorNumber::daemon, "The OpenSSL library cannot make a certificate for this server.");
     }
-    // The certificate comes last: where it stands, its key does.
     if (replaceFile(pair.key, made->key, 0600) < 0) {
         return -1;
     }
     return replaceFile(pair.certificate, made->certificate, 0644);
 }
 
-bool exists(const std::filesystem::path& path) {
+bool isThere(const std::filesystem::path& path) {
     std::error_code error;
     return std::filesystem::exists(path, error);
 }
@@ -99,7 +104,7 @@ bool exists(const std::filesystem::path& path) {
 
 std::optional<ServerCertificate> serverCertificate() {
     const Pair given{statePath("/etc/velt/tls/server.crt"), statePath("/etc/velt/tls/server.key")};
-    if (exists(given.certificate) || exists(given.key)) {
+    if (isThere(given.certificate) || isThere(given.key)) {
         return load(given);
     }
     const Pair own{statePath("/var/lib/velt/tls/server.crt"), statePath("/var/lib/velt/tls/server.key")};
@@ -107,7 +112,7 @@ std::optional<ServerCertificate> serverCertificate() {
     if (!lock) {
         return std::nullopt;
     }
-    if (!isCurrent(own) && makeOwn(own) < 0) {
+    if (!isUsable(own) && makeOwn(own) < 0) {
         return std::nullopt;
     }
     return load(own);
