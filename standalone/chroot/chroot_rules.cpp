@@ -1,10 +1,12 @@
 // The chroot rules of the contract (ftp/ftp_library.h).
+#include "ftp/ftp_library.h"
 #include "standalone/accounts/user_directory.h"
 #include "standalone/chroot/rule_store.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 
+#include <algorithm>
 #include <cstring>
 
 namespace velt {
@@ -96,13 +98,11 @@ int VELTFTPChrootRuleEnum(VLIBCSzList** list) {
 
 int VELTFTPChrootRuleParseToName(const char* line, int* isUser, char* name, int nameSize, char* path,
                                  int pathSize) {
-    return velt::atBoundary(
-        [&] { return velt::parseToName(line, isUser, name, nameSize, path, pathSize); });
+    return velt::atBoundary([&] { return velt::parseToName(line, isUser, name, nameSize, path, pathSize); });
 }
 
 int VELTFTPChrootRuleFormat(char* buf, int size, int isUser, int id, const char* path) {
-    return velt::atBoundary(
-        [&] { return velt::format(buf, size, isUser, id, path != nullptr ? path : ""); });
+    return velt::atBoundary([&] { return velt::format(buf, size, isUser, id, path != nullptr ? path : ""); });
 }
 
 int VELTFTPChrootRuleSave(VLIBCSzList* list) {

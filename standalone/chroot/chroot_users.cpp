@@ -1,4 +1,5 @@
 // The chroot users of the contract (ftp/ftp_library.h): the users with a rule that names their own home.
+#include "ftp/ftp_library.h"
 #include "standalone/accounts/user_directory.h"
 #include "standalone/chroot/rule_store.h"
 #include "standalone/core/boundary.h"
@@ -78,7 +79,8 @@ int enumerateOthers(VLIBCSzList** list, const UserFilter& filter) {
     const auto ids = chrootUserIds(*rules);
     const auto users = allUsers();
     for (const auto& user : *users) {
-        if (!ids.contains(user.uid) && matches(user, filter) && VLIBCSzListPush(list, user.name.c_str()) < 0) {
+        if (!ids.contains(user.uid) && matches(user, filter) &&
+            VLIBCSzListPush(list, user.name.c_str()) < 0) {
             return -1;
         }
     }
@@ -138,7 +140,8 @@ void addRules(std::vector<ChrootRule>& rules, const std::vector<uid_t>& ids) {
 
 void deleteRules(std::vector<ChrootRule>& rules, const std::vector<uid_t>& ids) {
     const std::unordered_set<uid_t> wanted(ids.begin(), ids.end());
-    std::erase_if(rules, [&](const ChrootRule& rule) { return confinesToHome(rule) && wanted.contains(rule.id); });
+    std::erase_if(rules,
+                  [&](const ChrootRule& rule) { return confinesToHome(rule) && wanted.contains(rule.id); });
 }
 
 int change(const VLIBCSzList* list, void (*apply)(std::vector<ChrootRule>&, const std::vector<uid_t>&)) {

@@ -56,9 +56,8 @@ std::optional<std::vector<ChrootRule>> parseRules(std::string_view text) {
 } // namespace
 
 bool isRulePath(std::string_view path) {
-    if (path.empty() || path.front() != '/' || std::ranges::any_of(path, [](unsigned char c) {
-            return c < 0x20 || c == 0x7f;
-        })) {
+    if (path.empty() || path.front() != '/' ||
+        std::ranges::any_of(path, [](unsigned char c) { return c < 0x20 || c == 0x7f; })) {
         return false;
     }
     while (!path.empty()) {
@@ -100,7 +99,8 @@ std::optional<std::vector<ChrootRule>> loadRules() {
     if (errno == ENOENT) {
         return std::vector<ChrootRule>();
     }
-    fail(ErrorNumber::store, "The file " + rulesFile().string() + " cannot be read: " + std::strerror(errno) + ".");
+    fail(ErrorNumber::store,
+         "The file " + rulesFile().string() + " cannot be read: " + std::strerror(errno) + ".");
     return std::nullopt;
 }
 

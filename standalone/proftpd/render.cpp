@@ -20,14 +20,14 @@ std::string quoted(const std::filesystem::path& path) {
 // One directive a line; its words are our own, numbers, and paths.
 class Text {
 public:
-    template <typename... Words> void line(const Words&... words) {
+    template<typename... Words> void line(const Words&... words) {
         (append(words), ...);
         text_.back() = '\n';
     }
     std::string take() { return std::move(text_); }
 
 private:
-    template <typename Word> void append(const Word& word) {
+    template<typename Word> void append(const Word& word) {
         if constexpr (std::is_same_v<Word, std::filesystem::path>) {
             text_ += quoted(word);
         } else if constexpr (std::is_integral_v<Word>) {

@@ -9,10 +9,11 @@
 namespace velt {
 
 struct ServerCertificate {
-    std::filesystem::path certificate; ///< PEM; the server's certificate first, then those that lead to its issuer
-    std::filesystem::path key;         ///< PEM
-    bool isRsa = false;                ///< else it is an elliptic curve's
-    std::string fingerprint; ///< changes when the certificate or its key does
+    std::filesystem::path
+        certificate;           ///< PEM; the server's certificate first, then those that lead to its issuer
+    std::filesystem::path key; ///< PEM
+    bool isRsa = false;        ///< else it is an elliptic curve's
+    std::string fingerprint;   ///< changes when the certificate or its key does
 };
 
 /// The administrator's certificate ("/etc/velt/tls/server.crt" and ".key" below the state root) if given, else a self-signed one,

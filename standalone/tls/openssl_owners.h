@@ -11,8 +11,8 @@
 
 namespace velt {
 
-template <auto release> struct Releaser {
-    template <typename Object> void operator()(Object* object) const { release(object); }
+template<auto release> struct Releaser {
+    template<typename Object> void operator()(Object* object) const { release(object); }
 };
 
 using BioOwner = std::unique_ptr<BIO, Releaser<BIO_free_all>>;
