@@ -11,8 +11,8 @@
 
 namespace velt {
 
-/// Calls `operation` and returns its int. An exception does not leave it: the result is then -1, with the last error
-/// set. The body of a contract function that can throw, allocation included, stands in it.
+/// Calls `operation` and returns its int. An exception does not leave it: the result is then -1, with the
+/// last error set. The body of a contract function that can throw, allocation included, stands in it.
 template<class Operation> int atBoundary(Operation&& operation) noexcept {
     try {
         return std::forward<Operation>(operation)();

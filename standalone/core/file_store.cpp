@@ -31,8 +31,8 @@ int syncFolder(const fs::path& folder) {
     return 0;
 }
 
-// Each new folder is made durable in the one that holds it, or a crash could take it away again together with the
-// file that was stored in it.
+// Each new folder is made durable in the one that holds it, or a crash could take it away again together with
+// the file that was stored in it.
 int makeFolder(const fs::path& folder) {
     std::vector<fs::path> missing;
     for (fs::path at = folder; !at.empty() && ::access(at.c_str(), F_OK) != 0; at = at.parent_path()) {

@@ -46,8 +46,8 @@ Pipe makePipe() {
     return made;
 }
 
-// The input stands in a file in memory: nobody has to feed a pipe while reading two others, and a program that
-// opens /dev/stdin can do so.
+// The input stands in a file in memory: nobody has to feed a pipe while reading two others, and a program
+// that opens /dev/stdin can do so.
 UniqueFd makeInput(std::string_view input) {
     UniqueFd file = aboveStandard(UniqueFd(::memfd_create("input", MFD_CLOEXEC)));
     while (file && !input.empty()) {
@@ -112,7 +112,8 @@ private:
     posix_spawn_file_actions_t actions_{};
 };
 
-// Takes what stands in the pipe now. Past the limit it is read all the same, so that the writer does not stall.
+// Takes what stands in the pipe now. Past the limit it is read all the same, so that the writer does not
+// stall.
 void drain(UniqueFd& pipe, std::string& text) {
     std::array<char, 65536> block;
     for (;;) {

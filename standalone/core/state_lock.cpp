@@ -19,12 +19,12 @@ namespace {
 
 using namespace std::chrono_literals;
 
-// Longer than any holder works, a daemon's start among them; past it somebody hangs, and saying so is better than
-// hanging as well.
+// Longer than any holder works, a daemon's start among them; past it somebody hangs, and saying so is better
+// than hanging as well.
 constexpr auto longestWait = 60s;
 
-// flock belongs to the opened file: each thread opens its own, so that threads of one process exclude each other
-// as processes do.
+// flock belongs to the opened file: each thread opens its own, so that threads of one process exclude each
+// other as processes do.
 struct ThreadLock {
     int depth = 0;
     UniqueFd file;
