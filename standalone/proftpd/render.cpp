@@ -3,6 +3,7 @@
 #include <arpa/inet.h>
 
 #include <algorithm>
+#include <array>
 #include <cstdlib>
 #include <string_view>
 #include <type_traits>
@@ -66,9 +67,15 @@ void renderModules(Text& text, const FtpSettings& settings, const ProftpdPlaces&
     }
 }
 
-bool isIPv4(const std::string& address) {
+// The address as the parser understood it, so that not even a text which it accepted is passed on.
+std::optional<std::string> ipv4(const std::string& text) {
     in_addr parsed{};
-    return inet_pton(AF_INET, address.c_str(), &parsed) == 1;
+    std::array<char, INET_ADDRSTRLEN> written{};
+    if (text.find('\0') != std::string::npos || inet_pton(AF_INET, text.c_str(), &parsed) != 1 ||
+        inet_ntop(AF_INET, &parsed, written.data(), written.size()) == nullptr) {
+        return std::nullopt;
+    }
+    return written.data();
 }
 
 void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
@@ -83,8 +90,9 @@ void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlace
     text.line("PassivePorts", custom ? record.passive_port_min : defaultPassiveRange.first,
               custom ? record.passive_port_max : defaultPassiveRange.last);
     // The directive would also take host and interface names, and announce what these resolve to.
-    if (record.use_ext_ip != 0 && isIPv4(settings.externalAddress)) {
-        text.line("MasqueradeAddress", settings.externalAddress);
+    const auto external = record.use_ext_ip != 0 ? ipv4(settings.externalAddress) : std::nullopt;
+    if (external) {
+        text.line("MasqueradeAddress", *external);
     }
     // Absent, it guards the active side only.
     text.line("AllowForeignAddress", record.enable_fxp != 0 ? "on" : "off");
