@@ -25,7 +25,10 @@ namespace {
 
 using std::chrono::milliseconds;
 
-constexpr milliseconds answerLimit{8000}; ///< more than the supervisor allows itself
+// A start is promised to be over within five seconds, of which the supervisor allows itself a little less. An end that takes
+// longer than this is taken out of the supervisor's hands.
+constexpr milliseconds startLimit{4900};
+constexpr milliseconds endLimit{6000};
 constexpr int reportDescriptor = 3;
 
 std::filesystem::path besideThisCode() {
@@ -97,7 +100,7 @@ std::string readReport(int descriptor) {
     std::string report;
     std::array<char, 4096> buffer{};
     pollfd event{descriptor, POLLIN, 0};
-    while (::poll(&event, 1, static_cast<int>(answerLimit.count())) > 0) {
+    while (::poll(&event, 1, static_cast<int>(startLimit.count())) > 0) {
         const ssize_t length = ::read(descriptor, buffer.data(), buffer.size());
         if (length <= 0) {
             break;
@@ -132,7 +135,7 @@ int SuperviseBackend::start(const DaemonPlan& plan) {
         return launchSupervisor(directory, plan);
     }
     const ControlRequest request{Command::start, {plan.configurationHash, plan.listenPorts, plan.arguments}};
-    const auto answer = askSupervisor(directory, daemon_, request, answerLimit);
+    const auto answer = askSupervisor(directory, daemon_, request, startLimit);
     if (!answer) {
         return failToStart("its supervisor, process " + std::to_string(now.supervisor.pid) +
                            ", does not answer");
@@ -171,7 +174,7 @@ int SuperviseBackend::failToStart(const std::string& reason) const {
 int SuperviseBackend::pause() {
     const ServiceState now = state();
     if (isAlive(now.supervisor)) {
-        const auto answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::pause, {}}, answerLimit);
+        const auto answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::pause, {}}, endLimit);
         if (answer && answer->empty()) {
             return 0;
         }
@@ -187,7 +190,7 @@ int SuperviseBackend::stop() {
     const ServiceState now = state();
     std::optional<std::string> answer;
     if (isAlive(now.supervisor)) {
-        answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::stop, {}}, answerLimit);
+        answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::stop, {}}, endLimit);
     }
     if (answer && !answer->empty()) {
         return fail(ErrorNumber::daemon, daemonTitle(daemon_) + " cannot be stopped: " + *answer + ".");
