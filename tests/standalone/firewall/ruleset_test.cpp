@@ -103,20 +103,20 @@ TEST(FirewallSettingsFile, IsReadAsWritten) {
 
 TEST(FirewallSettingsFile, ThatIsDamagedIsNamedWithItsLine) {
     const std::pair<const char*, const char*> damaged[] = {
-        {"", "line 0: the key version is missing"},
-        {"mode = drop\n", "line 1: the key version is missing"},
-        {"version = 2\n", "line 1: version \"2\" is not known here"},
-        {"version = 1\nmode = open\n", "line 2: the mode is none of off, accept and drop"},
-        {"version = 1\nmode\n", "line 2: this is no line of the form \"key = value\""},
-        {"version = 1\nports = 22 0\n", "line 2: \"0\" is neither a port nor a range of ports"},
+        {"", ": the key version is missing"},
+        {"mode = drop\n", ": the key version is missing"},
+        {"version = 2\n", ", line 1: version \"2\" is not known here"},
+        {"version = 1\nmode = open\n", ", line 2: the mode is none of off, accept and drop"},
+        {"version = 1\nmode\n", ", line 2: this is no line of the form \"key = value\""},
+        {"version = 1\nports = 22 0\n", ", line 2: \"0\" is neither a port nor a range of ports"},
         {"version = 1\nports = 22; flush ruleset\n",
-         "line 2: \"22;\" is neither a port nor a range of ports"},
-        {"version = 1\n\nmode = off\nmode = drop\n", "line 4: the key mode stands there a second time"},
-        {"version = 1\ncolour = red\n", "line 2: the key colour is not known"},
+         ", line 2: \"22;\" is neither a port nor a range of ports"},
+        {"version = 1\n\nmode = off\nmode = drop\n", ", line 4: the key mode stands there a second time"},
+        {"version = 1\ncolour = red\n", ", line 2: the key colour is not known"},
     };
     for (const auto& [text, complaint] : damaged) {
         EXPECT_FALSE(parseFirewallSettings(text, "/x/firewall.conf"));
-        EXPECT_EQ(lastErrorSentence(), std::string("Settings file /x/firewall.conf, ") + complaint + ".");
+        EXPECT_EQ(lastErrorSentence(), std::string("Settings file /x/firewall.conf") + complaint + ".");
     }
 }
 
