@@ -1,7 +1,9 @@
 #include "platform/account.h"
 
 #include "standalone/accounts/user_directory.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
+#include "standalone/text/plain_text.h"
 
 #include <limits>
 #include <map>
@@ -57,27 +59,33 @@ constexpr auto largestId = static_cast<unsigned>(std::numeric_limits<int>::max()
 } // namespace
 
 int VELTUserGet(const char* name, VELT_USER** out) {
-    if (name == nullptr || out == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid, "A user look-up needs a name.");
-    std::optional<velt::UserEntry> user = velt::userByName(name);
-    if (!user)
-        return velt::fail(velt::ErrorNumber::notFound, "There is no user \"" + std::string(name) + "\".");
-    if (user->uid > largestId)
-        return velt::fail(velt::ErrorNumber::invalid,
-                          "The number of user \"" + user->name + "\" is too large.");
-    *out = internUser(std::move(*user));
-    return 0;
+    return velt::atBoundary([&] {
+        if (name == nullptr || out == nullptr)
+            return velt::fail(velt::ErrorNumber::invalid, "A user look-up needs a name.");
+        std::optional<velt::UserEntry> user = velt::userByName(name);
+        if (!user)
+            return velt::fail(velt::ErrorNumber::notFound,
+                              "There is no user \"" + velt::plainText(name, 120) + "\".");
+        if (user->uid > largestId)
+            return velt::fail(velt::ErrorNumber::invalid,
+                              "The number of user \"" + velt::plainText(name, 120) + "\" is too large.");
+        *out = internUser(std::move(*user));
+        return 0;
+    });
 }
 
 int VELTGroupGet(const char* name, VELT_GROUP** out) {
-    if (name == nullptr || out == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid, "A group look-up needs a name.");
-    std::optional<velt::GroupEntry> group = velt::groupByName(name);
-    if (!group)
-        return velt::fail(velt::ErrorNumber::notFound, "There is no group \"" + std::string(name) + "\".");
-    if (group->gid > largestId)
-        return velt::fail(velt::ErrorNumber::invalid,
-                          "The number of group \"" + group->name + "\" is too large.");
-    *out = internGroup(std::move(*group));
-    return 0;
+    return velt::atBoundary([&] {
+        if (name == nullptr || out == nullptr)
+            return velt::fail(velt::ErrorNumber::invalid, "A group look-up needs a name.");
+        std::optional<velt::GroupEntry> group = velt::groupByName(name);
+        if (!group)
+            return velt::fail(velt::ErrorNumber::notFound,
+                              "There is no group \"" + velt::plainText(name, 120) + "\".");
+        if (group->gid > largestId)
+            return velt::fail(velt::ErrorNumber::invalid,
+                              "The number of group \"" + velt::plainText(name, 120) + "\" is too large.");
+        *out = internGroup(std::move(*group));
+        return 0;
+    });
 }

@@ -2,6 +2,7 @@
 
 #include "standalone/accounts/user_directory.h"
 #include "standalone/core/last_error.h"
+#include "standalone/text/plain_text.h"
 
 #include <memory>
 #include <new>
@@ -21,7 +22,7 @@ namespace SDK {
 User* User::LoadUser(const std::string& name) {
     std::optional<velt::UserEntry> user = velt::userByName(name);
     if (!user) {
-        velt::fail(velt::ErrorNumber::notFound, "There is no user \"" + name + "\".");
+        velt::fail(velt::ErrorNumber::notFound, "There is no user \"" + velt::plainText(name, 120) + "\".");
         return nullptr;
     }
     return std::make_unique<LoadedUser>(std::move(user->description)).release();

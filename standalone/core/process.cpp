@@ -7,9 +7,13 @@
 #include <signal.h>
 #include <spawn.h>
 #include <sys/mman.h>
-#include <sys/pidfd.h>
 #include <sys/wait.h>
 #include <unistd.h>
+
+// This C library's header forgets to say that its functions are C.
+extern "C" {
+#include <sys/pidfd.h>
+}
 
 #include <algorithm>
 #include <array>

@@ -51,9 +51,11 @@ TEST_F(FtpService, tlsOnlyRefusesPlainSessionsBeforeThePassword) {
     const auto file = curl(secure);
     EXPECT_EQ(file.exitCode, 0) << file.errors;
     EXPECT_EQ(file.output, "alice");
-    auto clearData = secure;
-    clearData[0] = "--ftp-ssl-control";
-    EXPECT_NE(curl(clearData).exitCode, 0) << "data must be encrypted, too";
+    const auto clearData = runProcess(
+        {"openssl", "s_client", "-connect", "127.0.0.1:2121", "-starttls", "ftp", "-quiet", "-crlf"},
+        "USER alice\nPASS alice-secret\nPBSZ 0\nPROT C\nNLST\nQUIT\n", std::chrono::seconds(20));
+    EXPECT_TRUE(contains(clearData.output, "230 ")) << clearData.output;
+    EXPECT_TRUE(contains(clearData.output, "522 ")) << "data must be encrypted, too: " << clearData.output;
 }
 
 TEST_F(FtpService, bothServicesShareOnePort) {
@@ -168,7 +170,7 @@ TEST_F(FtpService, passivePortsLieInTheCustomRange) {
 }
 
 TEST_F(FtpService, externalAddressIsAnnouncedOnlyWhenAsked) {
-    ASSERT_EQ(VLIBCINFOSetKeyValue("ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
     start();
     {
         FtpSession session(port);
