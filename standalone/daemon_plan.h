@@ -11,10 +11,12 @@ namespace velt {
 
 /// One daemon, ready to be started in the foreground by its argument vector; it writes its reasons to standard error.
 struct DaemonPlan {
-    std::vector<std::string> arguments; ///< arguments[0] is an absolute path; started with a clean environment
-    std::filesystem::path executable;   ///< what runs in that process in the end (a wrapper replaces itself by it)
-    std::string configurationHash;      ///< equal hashes: a running daemon need not be started anew
-    std::vector<int> listenPorts;       ///< TCP ports that the process listens on once it is ready
+    std::vector<std::string>
+        arguments; ///< arguments[0] is an absolute path; started with a clean environment
+    std::filesystem::path
+        executable;                ///< what runs in that process in the end (a wrapper replaces itself by it)
+    std::string configurationHash; ///< equal hashes: a running daemon need not be started anew
+    std::vector<int> listenPorts;  ///< TCP ports that the process listens on once it is ready
 };
 
 /// Renders, tests and writes the configuration that follows from the stored settings, and all that it needs: certificate or host

@@ -18,7 +18,9 @@
 #include <filesystem>
 #include <functional>
 #include <map>
+#include <optional>
 #include <string>
+#include <vector>
 
 namespace velt {
 
@@ -39,13 +41,17 @@ void setRequestActor(const std::string& actor, const std::string& address);
 
 /// A system event, as it was announced.
 struct SystemEvent {
+    std::chrono::system_clock::time_point time;
     std::string name; ///< "velt.service.action"
     std::map<std::string, std::string> parameters;
+    std::string actor; ///< "" for the system itself
+    std::string address;
 };
 
 /// An entry of the administrator log, as it was written.
 struct LogEntry {
-    std::chrono::system_clock::time_point time;
+    std::int64_t id = 0;                        ///< grows with each entry; none is used twice
+    std::chrono::system_clock::time_point time; ///< in whole milliseconds
     int category = 0;
     int level = 0;
     unsigned event = 0;               ///< 0x11B000nn
@@ -68,6 +74,19 @@ Subscription subscribeLog(LogSubscriber subscriber);
 /// Ends a subscription of either kind. When it returns, the subscriber is not running and is not called
 /// again; a subscriber must not end its own subscription. An unknown one is ignored.
 void unsubscribe(Subscription subscription);
+
+/// Which entries of the administrator log are wanted; what is not set does not narrow.
+struct LogFilter {
+    std::optional<std::chrono::system_clock::time_point> since; ///< of this moment or later
+    std::optional<unsigned> event;
+    std::optional<std::string> actor;     ///< exactly this text
+    std::optional<std::int64_t> beforeId; ///< older than this entry: the last id of a page leads to the next
+    int limit = 100;                      ///< 1 to 1000
+};
+
+/// The newest entries that the filter lets through, newest first. Nothing, with the last error set, when the log
+/// cannot be read.
+std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter);
 
 /// Who holds a port.
 struct PortConflict {
