@@ -3,10 +3,10 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/unique_fd.h"
+#include "standalone/installed_files.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/supervise/control_channel.h"
 
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <poll.h>
 #include <spawn.h>
@@ -16,7 +16,6 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
-#include <cstdlib>
 #include <cstring>
 #include <utility>
 
@@ -30,27 +29,6 @@ using std::chrono::milliseconds;
 constexpr milliseconds startLimit{4900};
 constexpr milliseconds endLimit{6000};
 constexpr int reportDescriptor = 3;
-
-std::filesystem::path besideThisCode() {
-    Dl_info info{};
-    if (::dladdr(reinterpret_cast<const void*>(&makeServiceBackend), &info) == 0 ||
-        info.dli_fname == nullptr) {
-        return {};
-    }
-    std::error_code error;
-    return std::filesystem::absolute(info.dli_fname, error).parent_path() / "velt-supervise";
-}
-
-std::filesystem::path supervisorProgram() {
-    if (const char* chosen = ::secure_getenv("VELT_SUPERVISE")) {
-        return chosen;
-    }
-    const std::filesystem::path beside = besideThisCode();
-    if (::access(beside.c_str(), X_OK) == 0) {
-        return beside;
-    }
-    return VELT_SUPERVISE_PATH;
-}
 
 std::string joinPorts(const std::vector<int>& ports) {
     std::string text;
@@ -150,7 +128,7 @@ int SuperviseBackend::launchSupervisor(const std::filesystem::path& directory, c
     }
     const UniqueFd readEnd(ends[0]);
     UniqueFd writeEnd(ends[1]);
-    const std::string program = supervisorProgram().string();
+    const std::string program = installedFile("velt-supervise").string();
     std::vector<std::string> arguments{program, directory.string(), daemon_, plan.configurationHash,
                                        joinPorts(plan.listenPorts)};
     arguments.insert(arguments.end(), plan.arguments.begin(), plan.arguments.end());

@@ -111,6 +111,7 @@ void DaemonTest::SetUp() {
     ASSERT_NE(::mkdtemp(folder.data()), nullptr);
     root_ = folder;
     setStateRoot(root_);
+    ASSERT_EQ(::setenv("VELT_LIBEXEC_DIR", VELT_TEST_LIBEXEC, 1), 0);
     ASSERT_EQ(::prctl(PR_SET_CHILD_SUBREAPER, 1), 0);
 }
 
