@@ -91,15 +91,16 @@ std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, con
         line = trimmed(line.substr(0, line.find('#')));
         problem = line.empty() ? "" : parser.take(line);
     }
-    if (problem.empty() && !parser.hasVersion()) {
-        problem = "the key version is missing";
-    }
+    std::string place = "Settings file " + file;
     if (!problem.empty()) {
-        fail(ErrorNumber::damaged,
-             "Settings file " + file + ", line " + std::to_string(number) + ": " + problem + ".");
-        return std::nullopt;
+        place += ", line " + std::to_string(number);
+    } else if (!parser.hasVersion()) {
+        problem = "the key version is missing";
+    } else {
+        return parser.settings();
     }
-    return parser.settings();
+    fail(ErrorNumber::damaged, place + ": " + problem + ".");
+    return std::nullopt;
 }
 
 std::optional<FirewallSettings> loadFirewallSettings() {

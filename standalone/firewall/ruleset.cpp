@@ -2,8 +2,6 @@
 
 #include "standalone/ports/port_range.h"
 
-#include <cstdlib>
-
 namespace velt {
 namespace {
 
@@ -29,9 +27,9 @@ std::string renderOpenPorts(const std::vector<VELT_FTP_PORT_RANGE>& ranges) {
 std::vector<VELT_FTP_PORT_RANGE> servicePorts(const FtpSettings& ftp, const SftpSettings& sftp) {
     std::vector<VELT_FTP_PORT_RANGE> ports;
     if ((ftp.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0) {
-        const int control = std::atoi(ftp.record.portnum);
+        const int control = controlPort(ftp.record);
         ports.push_back({control, control});
-        ports.push_back(passiveRangeOf(ftp.record));
+        ports.push_back(passiveRange(ftp.record));
     }
     if (sftp.enabled) {
         ports.push_back({sftp.port, sftp.port});

@@ -11,7 +11,6 @@
 #include "standalone/standalone.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <optional>
 #include <set>
 #include <string_view>
@@ -67,7 +66,7 @@ std::optional<ConfiguredPorts> loadConfiguredPorts() {
     if (!ftp || !sftp) {
         return std::nullopt;
     }
-    return ConfiguredPorts{std::atoi(ftp->record.portnum), passiveRangeOf(ftp->record), sftp->port};
+    return ConfiguredPorts{controlPort(ftp->record), passiveRange(ftp->record), sftp->port};
 }
 
 std::optional<Conflict> conflictOfForm(const Question& question) {

@@ -1,7 +1,5 @@
 #include "standalone/ports/port_range.h"
 
-#include "standalone/settings/settings.h"
-
 #include <charconv>
 
 namespace velt {
@@ -32,13 +30,6 @@ std::optional<VELT_FTP_PORT_RANGE> parsePortRange(std::string_view text) {
 std::string formatPortRange(const VELT_FTP_PORT_RANGE& range) {
     const std::string first = std::to_string(range.first);
     return range.first == range.last ? first : first + "-" + std::to_string(range.last);
-}
-
-VELT_FTP_PORT_RANGE passiveRangeOf(const _tag_VELT_FTP_CONF_& record) {
-    if (record.passive_port_min != 0 && record.passive_port_max != 0) {
-        return {record.passive_port_min, record.passive_port_max};
-    }
-    return defaultPassiveRange;
 }
 
 } // namespace velt

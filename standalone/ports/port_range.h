@@ -16,9 +16,6 @@ std::optional<VELT_FTP_PORT_RANGE> parsePortRange(std::string_view text);
 /// The reverse of parsePortRange.
 std::string formatPortRange(const VELT_FTP_PORT_RANGE& range);
 
-/// The passive range that the record puts in force: its own where both ends are set, else the default one.
-VELT_FTP_PORT_RANGE passiveRangeOf(const _tag_VELT_FTP_CONF_& record);
-
 } // namespace velt
 
 #endif

@@ -55,6 +55,8 @@ void renderServer(Text& text, const ProftpdPlaces& places) {
     text.line("WtmpLog off");
     text.line("UseReverseDNS off");
     text.line("AllowOverwrite on");
+    // Without it neither APPE nor the resumption of a broken upload is allowed.
+    text.line("AllowStoreRestart on");
     text.line("ControlsEngine off");
 }
 

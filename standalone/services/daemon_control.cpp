@@ -12,7 +12,6 @@
 
 #include <array>
 #include <cerrno>
-#include <cstdlib>
 #include <cstring>
 #include <string>
 #include <utility>
@@ -68,7 +67,7 @@ std::vector<int> wantedPorts(Daemon daemon) {
     if (daemon == Daemon::ftp) {
         const auto settings = loadFtpSettings();
         if (settings && ftpIsWanted(*settings)) {
-            return {std::atoi(settings->record.portnum)};
+            return {controlPort(settings->record)};
         }
     } else if (const auto settings = loadSftpSettings(); settings && settings->enabled) {
         return {settings->port};

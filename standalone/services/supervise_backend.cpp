@@ -3,10 +3,10 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/unique_fd.h"
+#include "standalone/installed_files.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/supervise/control_channel.h"
 
-#include <dlfcn.h>
 #include <fcntl.h>
 #include <poll.h>
 #include <spawn.h>
@@ -16,7 +16,6 @@
 #include <array>
 #include <cerrno>
 #include <csignal>
-#include <cstdlib>
 #include <cstring>
 #include <utility>
 
@@ -25,29 +24,11 @@ namespace {
 
 using std::chrono::milliseconds;
 
-constexpr milliseconds answerLimit{8000}; ///< more than the supervisor allows itself
+// A start is promised to be over within five seconds, of which the supervisor allows itself a little less. An end that takes
+// longer than this is taken out of the supervisor's hands.
+constexpr milliseconds startLimit{4900};
+constexpr milliseconds endLimit{6000};
 constexpr int reportDescriptor = 3;
-
-std::filesystem::path besideThisCode() {
-    Dl_info info{};
-    if (::dladdr(reinterpret_cast<const void*>(&makeServiceBackend), &info) == 0 ||
-        info.dli_fname == nullptr) {
-        return {};
-    }
-    std::error_code error;
-    return std::filesystem::absolute(info.dli_fname, error).parent_path() / "velt-supervise";
-}
-
-std::filesystem::path supervisorProgram() {
-    if (const char* chosen = ::secure_getenv("VELT_SUPERVISE")) {
-        return chosen;
-    }
-    const std::filesystem::path beside = besideThisCode();
-    if (::access(beside.c_str(), X_OK) == 0) {
-        return beside;
-    }
-    return VELT_SUPERVISE_PATH;
-}
 
 std::string joinPorts(const std::vector<int>& ports) {
     std::string text;
@@ -97,7 +78,7 @@ std::string readReport(int descriptor) {
     std::string report;
     std::array<char, 4096> buffer{};
     pollfd event{descriptor, POLLIN, 0};
-    while (::poll(&event, 1, static_cast<int>(answerLimit.count())) > 0) {
+    while (::poll(&event, 1, static_cast<int>(startLimit.count())) > 0) {
         const ssize_t length = ::read(descriptor, buffer.data(), buffer.size());
         if (length <= 0) {
             break;
@@ -132,7 +113,7 @@ int SuperviseBackend::start(const DaemonPlan& plan) {
         return launchSupervisor(directory, plan);
     }
     const ControlRequest request{Command::start, {plan.configurationHash, plan.listenPorts, plan.arguments}};
-    const auto answer = askSupervisor(directory, daemon_, request, answerLimit);
+    const auto answer = askSupervisor(directory, daemon_, request, startLimit);
     if (!answer) {
         return failToStart("its supervisor, process " + std::to_string(now.supervisor.pid) +
                            ", does not answer");
@@ -147,7 +128,7 @@ int SuperviseBackend::launchSupervisor(const std::filesystem::path& directory, c
     }
     const UniqueFd readEnd(ends[0]);
     UniqueFd writeEnd(ends[1]);
-    const std::string program = supervisorProgram().string();
+    const std::string program = installedFile("velt-supervise").string();
     std::vector<std::string> arguments{program, directory.string(), daemon_, plan.configurationHash,
                                        joinPorts(plan.listenPorts)};
     arguments.insert(arguments.end(), plan.arguments.begin(), plan.arguments.end());
@@ -171,7 +152,7 @@ int SuperviseBackend::failToStart(const std::string& reason) const {
 int SuperviseBackend::pause() {
     const ServiceState now = state();
     if (isAlive(now.supervisor)) {
-        const auto answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::pause, {}}, answerLimit);
+        const auto answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::pause, {}}, endLimit);
         if (answer && answer->empty()) {
             return 0;
         }
@@ -187,7 +168,7 @@ int SuperviseBackend::stop() {
     const ServiceState now = state();
     std::optional<std::string> answer;
     if (isAlive(now.supervisor)) {
-        answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::stop, {}}, answerLimit);
+        answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::stop, {}}, endLimit);
     }
     if (answer && !answer->empty()) {
         return fail(ErrorNumber::daemon, daemonTitle(daemon_) + " cannot be stopped: " + *answer + ".");

@@ -6,8 +6,6 @@
 
 namespace velt {
 
-/// The program velt-supervise is looked for at $VELT_SUPERVISE, beside the library or program that contains this code, and where it
-/// is installed.
 class SuperviseBackend : public ServiceBackend {
 public:
     explicit SuperviseBackend(std::string daemon);

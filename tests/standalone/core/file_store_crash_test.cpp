@@ -1,4 +1,5 @@
-// A store interrupted at each of its system calls: the linker puts the functions below in the place of the calls.
+// A store interrupted at each of its system calls: the linker puts the functions below in the place of the
+// calls.
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "tests/standalone/support/temporary_folder.h"

@@ -33,7 +33,7 @@ Change range(int first, int last) {
     };
 }
 
-Change address(std::string text) {
+Change address(const std::string& text) {
     return [text](FtpSettings& settings) { settings.externalAddress = text; };
 }
 

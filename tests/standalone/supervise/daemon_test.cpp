@@ -42,10 +42,11 @@ int connectTo(int port) {
 } // namespace
 
 int freePort() {
-    // Tests run side by side: each process begins its search elsewhere.
-    static int next = 20000 + (::getpid() * 37) % 10000;
+    // Tests run side by side, so each process begins its search elsewhere. In wide steps, for tests that ask about ranges.
+    static int next = (::getpid() * 370) % 10000;
     for (;;) {
-        const int port = next++;
+        next = (next + 20) % 10000;
+        const int port = 20000 + next;
         const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
         const bool isFree = bindTo(descriptor, port);
         ::close(descriptor);
@@ -110,6 +111,7 @@ void DaemonTest::SetUp() {
     ASSERT_NE(::mkdtemp(folder.data()), nullptr);
     root_ = folder;
     setStateRoot(root_);
+    ASSERT_EQ(::setenv("VELT_LIBEXEC_DIR", VELT_TEST_LIBEXEC, 1), 0);
     ASSERT_EQ(::prctl(PR_SET_CHILD_SUBREAPER, 1), 0);
 }
 
