@@ -1,7 +1,6 @@
 #include "standalone/core/state_root.h"
 
 #include <cstdlib>
-#include <utility>
 
 namespace velt {
 
@@ -19,8 +18,8 @@ std::filesystem::path& stateRoot() {
 
 } // namespace
 
-void setStateRoot(std::filesystem::path root) {
-    stateRoot() = std::filesystem::absolute(std::move(root));
+void setStateRoot(const std::filesystem::path& root) {
+    stateRoot() = std::filesystem::absolute(root);
 }
 
 std::filesystem::path statePath(std::string_view absolutePath) {

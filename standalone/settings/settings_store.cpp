@@ -49,7 +49,7 @@ int storeSftpFile(const SftpSettings& settings) {
 }
 
 bool isMissing(std::string_view name) {
-    return ::access(statePath(name).c_str(), F_OK) != 0 && errno == ENOENT;
+    return ::access(statePath(name).c_str(), F_OK) != 0;
 }
 
 } // namespace
