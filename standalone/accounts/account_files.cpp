@@ -19,8 +19,9 @@ std::string_view cut(std::string_view& rest, char separator) {
 std::string_view trimmed(std::string_view text) {
     constexpr std::string_view blanks = " \t\r";
     const std::size_t first = text.find_first_not_of(blanks);
-    if (first == std::string_view::npos)
+    if (first == std::string_view::npos) {
         return {};
+    }
     return text.substr(first, text.find_last_not_of(blanks) - first + 1);
 }
 
@@ -31,10 +32,12 @@ template<typename Number> bool parseNumber(std::string_view text, Number& number
 
 template<std::size_t count>
 bool splitFields(std::string_view line, std::array<std::string_view, count>& fields) {
-    if (static_cast<std::size_t>(std::count(line.begin(), line.end(), ':')) != count - 1)
+    if (static_cast<std::size_t>(std::count(line.begin(), line.end(), ':')) != count - 1) {
         return false;
-    for (std::string_view& field : fields)
+    }
+    for (std::string_view& field : fields) {
         field = cut(line, ':');
+    }
     return true;
 }
 
@@ -54,12 +57,14 @@ std::vector<UserEntry> parsePasswd(std::string_view text) {
     users.reserve(static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n')) + 1);
     while (!text.empty()) {
         std::array<std::string_view, 7> fields;
-        if (!splitFields(cut(text, '\n'), fields) || !namesAccount(fields[0]))
+        if (!splitFields(cut(text, '\n'), fields) || !namesAccount(fields[0])) {
             continue;
+        }
         uid_t uid = 0;
         gid_t gid = 0;
-        if (!parseNumber(fields[2], uid) || !parseNumber(fields[3], gid))
+        if (!parseNumber(fields[2], uid) || !parseNumber(fields[3], gid)) {
             continue;
+        }
         users.push_back({std::string(fields[0]), uid, gid, std::string(fields[5]), descriptionOf(fields[4]),
                          sourceLocal});
     }
@@ -70,16 +75,20 @@ std::vector<LocalGroup> parseGroup(std::string_view text) {
     std::vector<LocalGroup> groups;
     while (!text.empty()) {
         std::array<std::string_view, 4> fields;
-        if (!splitFields(cut(text, '\n'), fields) || !namesAccount(fields[0]))
+        if (!splitFields(cut(text, '\n'), fields) || !namesAccount(fields[0])) {
             continue;
+        }
         gid_t gid = 0;
-        if (!parseNumber(fields[2], gid))
+        if (!parseNumber(fields[2], gid)) {
             continue;
+        }
         LocalGroup group{{std::string(fields[0]), gid, sourceLocal}, {}};
         std::string_view members = trimmed(fields[3]);
-        while (!members.empty())
-            if (const std::string_view member = trimmed(cut(members, ',')); !member.empty())
+        while (!members.empty()) {
+            if (const std::string_view member = trimmed(cut(members, ',')); !member.empty()) {
                 group.members.emplace_back(member);
+            }
+        }
         groups.push_back(std::move(group));
     }
     return groups;
@@ -90,16 +99,19 @@ UidRange parseLoginDefs(std::string_view text) {
     while (!text.empty()) {
         const std::string_view line = trimmed(cut(text, '\n'));
         const std::size_t end = line.find_first_of(" \t");
-        if (end == std::string_view::npos)
+        if (end == std::string_view::npos) {
             continue;
+        }
         const std::string_view key = line.substr(0, end);
         uid_t number = 0;
-        if (!parseNumber(trimmed(line.substr(end)), number))
+        if (!parseNumber(trimmed(line.substr(end)), number)) {
             continue;
-        if (key == "UID_MIN")
+        }
+        if (key == "UID_MIN") {
             range.first = number;
-        else if (key == "UID_MAX")
+        } else if (key == "UID_MAX") {
             range.last = number;
+        }
     }
     return range;
 }

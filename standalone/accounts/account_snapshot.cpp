@@ -44,14 +44,19 @@ std::shared_ptr<const UserSnapshot> UserSnapshot::make(std::vector<UserEntry> lo
     std::unordered_set<std::string> localNames;
     people.reserve(local.size() + remote.size());
     // The names matter only to keep remote accounts apart from local ones.
-    if (!remote.empty())
-        for (const UserEntry& user : local)
+    if (!remote.empty()) {
+        for (const UserEntry& user : local) {
             localNames.insert(user.name);
-    for (UserEntry& user : local)
+        }
+    }
+    for (UserEntry& user : local) {
         (isPerson(user, range) ? people : systemAccounts).push_back(std::move(user));
-    for (const UserEntry& user : remote)
-        if (user.name != "nobody" && localNames.insert(user.name).second)
+    }
+    for (const UserEntry& user : remote) {
+        if (user.name != "nobody" && localNames.insert(user.name).second) {
             people.push_back(user);
+        }
+    }
     return std::shared_ptr<const UserSnapshot>(
         new UserSnapshot{UserTable(std::move(people)), UserTable(std::move(systemAccounts))});
 }
@@ -62,8 +67,9 @@ GroupSnapshot::GroupSnapshot(std::vector<LocalGroup> groups) : groups_(std::move
     for (std::size_t i = 0; i < groups_.size(); ++i) {
         names_.try_emplace(groups_[i].entry.name, i);
         numbers_.try_emplace(groups_[i].entry.gid, i);
-        for (const std::string& member : groups_[i].members)
+        for (const std::string& member : groups_[i].members) {
             memberships_[member].push_back(groups_[i].entry.gid);
+        }
     }
 }
 

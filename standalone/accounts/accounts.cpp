@@ -60,15 +60,18 @@ constexpr auto largestId = static_cast<unsigned>(std::numeric_limits<int>::max()
 
 int VELTUserGet(const char* name, VELT_USER** out) {
     return velt::atBoundary([&] {
-        if (name == nullptr || out == nullptr)
+        if (name == nullptr || out == nullptr) {
             return velt::fail(velt::ErrorNumber::invalid, "A user look-up needs a name.");
+        }
         std::optional<velt::UserEntry> user = velt::userByName(name);
-        if (!user)
+        if (!user) {
             return velt::fail(velt::ErrorNumber::notFound,
                               "There is no user \"" + velt::plainText(name, 120) + "\".");
-        if (user->uid > largestId)
+        }
+        if (user->uid > largestId) {
             return velt::fail(velt::ErrorNumber::invalid,
                               "The number of user \"" + velt::plainText(name, 120) + "\" is too large.");
+        }
         *out = internUser(std::move(*user));
         return 0;
     });
@@ -76,15 +79,18 @@ int VELTUserGet(const char* name, VELT_USER** out) {
 
 int VELTGroupGet(const char* name, VELT_GROUP** out) {
     return velt::atBoundary([&] {
-        if (name == nullptr || out == nullptr)
+        if (name == nullptr || out == nullptr) {
             return velt::fail(velt::ErrorNumber::invalid, "A group look-up needs a name.");
+        }
         std::optional<velt::GroupEntry> group = velt::groupByName(name);
-        if (!group)
+        if (!group) {
             return velt::fail(velt::ErrorNumber::notFound,
                               "There is no group \"" + velt::plainText(name, 120) + "\".");
-        if (group->gid > largestId)
+        }
+        if (group->gid > largestId) {
             return velt::fail(velt::ErrorNumber::invalid,
                               "The number of group \"" + velt::plainText(name, 120) + "\" is too large.");
+        }
         *out = internGroup(std::move(*group));
         return 0;
     });

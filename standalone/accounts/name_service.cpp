@@ -44,8 +44,9 @@ bool withBuffer(std::vector<char>& buffer, const std::function<nss_status(char*,
     for (;;) {
         int error = 0;
         const nss_status status = look(buffer.data(), buffer.size(), &error);
-        if (status != NSS_STATUS_TRYAGAIN || error != ERANGE || buffer.size() >= largestRecord)
+        if (status != NSS_STATUS_TRYAGAIN || error != ERANGE || buffer.size() >= largestRecord) {
             return status == NSS_STATUS_SUCCESS;
+        }
         buffer.resize(buffer.size() * 2);
     }
 }
@@ -70,8 +71,9 @@ std::unique_ptr<NameService> NameService::load(const std::filesystem::path& fold
     const std::string file = "libnss_" + std::string(name) + ".so.2";
     // Never closed: such modules start threads and keep connections of their own.
     void* module = dlopen(folder.empty() ? file.c_str() : (folder / file).c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (module == nullptr)
+    if (module == nullptr) {
         return nullptr;
+    }
     auto functions = std::make_unique<Functions>();
     const std::string prefix = "_nss_" + std::string(name) + "_";
     bind(module, prefix, "setpwent", functions->setpwent);
@@ -93,19 +95,23 @@ NameService::~NameService() = default;
 
 std::vector<UserEntry> NameService::users() const {
     std::vector<UserEntry> users;
-    if (functions_->getpwent == nullptr)
+    if (functions_->getpwent == nullptr) {
         return users;
+    }
     const std::lock_guard lock(enumerationMutex);
-    if (functions_->setpwent != nullptr && functions_->setpwent(0) != NSS_STATUS_SUCCESS)
+    if (functions_->setpwent != nullptr && functions_->setpwent(0) != NSS_STATUS_SUCCESS) {
         return users;
+    }
     std::vector<char> buffer(4096);
     passwd record{};
     while (withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
         return functions_->getpwent(&record, text, size, error);
-    }))
+    })) {
         users.push_back(entryOf(record, source_));
-    if (functions_->endpwent != nullptr)
+    }
+    if (functions_->endpwent != nullptr) {
         functions_->endpwent();
+    }
     return users;
 }
 
@@ -114,8 +120,9 @@ std::optional<UserEntry> NameService::userByName(const std::string& name) const 
     passwd record{};
     if (functions_->getpwnam == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
             return functions_->getpwnam(name.c_str(), &record, text, size, error);
-        }))
+        })) {
         return std::nullopt;
+    }
     return entryOf(record, source_);
 }
 
@@ -124,8 +131,9 @@ std::optional<UserEntry> NameService::userById(uid_t uid) const {
     passwd record{};
     if (functions_->getpwuid == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
             return functions_->getpwuid(uid, &record, text, size, error);
-        }))
+        })) {
         return std::nullopt;
+    }
     return entryOf(record, source_);
 }
 
@@ -134,8 +142,9 @@ std::optional<GroupEntry> NameService::groupByName(const std::string& name) cons
     group record{};
     if (functions_->getgrnam == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
             return functions_->getgrnam(name.c_str(), &record, text, size, error);
-        }))
+        })) {
         return std::nullopt;
+    }
     return GroupEntry{textOf(record.gr_name), record.gr_gid, source_};
 }
 
@@ -144,26 +153,30 @@ std::optional<GroupEntry> NameService::groupById(gid_t gid) const {
     group record{};
     if (functions_->getgrgid == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
             return functions_->getgrgid(gid, &record, text, size, error);
-        }))
+        })) {
         return std::nullopt;
+    }
     return GroupEntry{textOf(record.gr_name), record.gr_gid, source_};
 }
 
 std::vector<gid_t> NameService::groupsOf(const std::string& user, gid_t primary) const {
-    if (functions_->initgroups == nullptr)
+    if (functions_->initgroups == nullptr) {
         return {};
+    }
     long count = 0;
     long room = 64;
     int error = 0;
     auto* groups = static_cast<gid_t*>(std::malloc(static_cast<std::size_t>(room) * sizeof(gid_t)));
-    if (groups == nullptr)
+    if (groups == nullptr) {
         return {};
+    }
     // The module grows the array with realloc.
     const nss_status status =
         functions_->initgroups(user.c_str(), primary, &count, &room, &groups, -1, &error);
     std::vector<gid_t> found;
-    if (status == NSS_STATUS_SUCCESS && count > 0)
+    if (status == NSS_STATUS_SUCCESS && count > 0) {
         found.assign(groups, groups + count);
+    }
     std::free(groups);
     std::erase(found, primary);
     return found;
@@ -176,15 +189,18 @@ bool nsswitchNames(std::string_view text, std::string_view database, std::string
         text = end == std::string_view::npos ? std::string_view{} : text.substr(end + 1);
         line = line.substr(0, line.find('#'));
         const std::size_t colon = line.find(':');
-        if (colon == std::string_view::npos)
+        if (colon == std::string_view::npos) {
             continue;
+        }
         std::string_view key = line.substr(0, colon);
         key.remove_prefix(std::min(key.find_first_not_of(" \t"), key.size()));
-        if (key.substr(0, key.find_first_of(" \t")) != database)
+        if (key.substr(0, key.find_first_of(" \t")) != database) {
             continue;
+        }
         std::string words = " " + std::string(line.substr(colon + 1)) + " ";
-        for (char& character : words)
+        for (char& character : words) {
             character = character == '\t' ? ' ' : character;
+        }
         return words.find(" " + std::string(service) + " ") != std::string::npos;
     }
     return false;

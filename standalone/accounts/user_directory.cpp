@@ -82,14 +82,17 @@ void Directory::readRemote() {
     remote_.clear();
     for (const ModuleName& module : moduleNames) {
         // A module that is installed but not in use knows accounts that cannot log in.
-        if (!nsswitchNames(configuration, "passwd", module.name))
+        if (!nsswitchNames(configuration, "passwd", module.name)) {
             continue;
+        }
         std::shared_ptr<const NameService> service =
             NameService::load(sources_.moduleFolder, module.name, module.source);
-        if (service == nullptr)
+        if (service == nullptr) {
             continue;
-        for (UserEntry& user : service->users())
+        }
+        for (UserEntry& user : service->users()) {
             remote_.push_back(std::move(user));
+        }
         modules_.push_back(std::move(service));
     }
     remoteReadAt_ = Clock::now();
@@ -106,8 +109,9 @@ std::shared_ptr<const UserSnapshot> Directory::users() {
         readRemote();
         remoteChanged = hadRemote || !remote_.empty();
     }
-    if (users_ != nullptr && !remoteChanged && passwd == passwdStamp_ && loginDefs == loginDefsStamp_)
+    if (users_ != nullptr && !remoteChanged && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
         return users_;
+    }
     users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remote_,
                                 parseLoginDefs(readFile(sources_.loginDefs).value_or("")));
     passwdStamp_ = passwd;
@@ -127,8 +131,9 @@ std::shared_ptr<const GroupSnapshot> Directory::groups() {
 
 Modules Directory::modules() {
     const std::lock_guard lock(mutex_);
-    if (!remoteIsCurrent())
+    if (!remoteIsCurrent()) {
         readRemote();
+    }
     return modules_;
 }
 
@@ -160,69 +165,90 @@ std::shared_ptr<const std::vector<UserEntry>> allUsers() {
 
 std::optional<UserEntry> userByName(const std::string& name) {
     const std::shared_ptr<const UserSnapshot> snapshot = directory().users();
-    if (const UserEntry* user = snapshot->systemAccounts.byName(name))
+    if (const UserEntry* user = snapshot->systemAccounts.byName(name)) {
         return *user;
-    if (const UserEntry* user = snapshot->people.byName(name))
+    }
+    if (const UserEntry* user = snapshot->people.byName(name)) {
         return *user;
-    for (const auto& module : directory().modules())
-        if (std::optional<UserEntry> user = module->userByName(name))
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<UserEntry> user = module->userByName(name)) {
             return user;
+        }
+    }
     return std::nullopt;
 }
 
 std::optional<UserEntry> userById(uid_t uid) {
     const std::shared_ptr<const UserSnapshot> snapshot = directory().users();
-    if (const UserEntry* user = snapshot->systemAccounts.byId(uid))
+    if (const UserEntry* user = snapshot->systemAccounts.byId(uid)) {
         return *user;
-    if (const UserEntry* user = snapshot->people.byId(uid))
+    }
+    if (const UserEntry* user = snapshot->people.byId(uid)) {
         return *user;
-    for (const auto& module : directory().modules())
-        if (std::optional<UserEntry> user = module->userById(uid))
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<UserEntry> user = module->userById(uid)) {
             return user;
+        }
+    }
     return std::nullopt;
 }
 
 std::optional<GroupEntry> groupByName(const std::string& name) {
-    if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byName(name))
+    if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byName(name)) {
         return *group;
-    for (const auto& module : directory().modules())
-        if (std::optional<GroupEntry> group = module->groupByName(name))
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<GroupEntry> group = module->groupByName(name)) {
             return group;
+        }
+    }
     return std::nullopt;
 }
 
 std::optional<GroupEntry> groupById(gid_t gid) {
-    if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byId(gid))
+    if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byId(gid)) {
         return *group;
-    for (const auto& module : directory().modules())
-        if (std::optional<GroupEntry> group = module->groupById(gid))
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<GroupEntry> group = module->groupById(gid)) {
             return group;
+        }
+    }
     return std::nullopt;
 }
 
 std::vector<gid_t> groupsOf(const UserEntry& user) {
     std::vector<gid_t> groups{user.gid};
     const auto add = [&groups](const std::vector<gid_t>& further) {
-        for (const gid_t gid : further)
-            if (std::find(groups.begin(), groups.end(), gid) == groups.end())
+        for (const gid_t gid : further) {
+            if (std::find(groups.begin(), groups.end(), gid) == groups.end()) {
                 groups.push_back(gid);
+            }
+        }
     };
     add(directory().groups()->groupsOf(user.name));
-    for (const auto& module : directory().modules())
+    for (const auto& module : directory().modules()) {
         add(module->groupsOf(user.name, user.gid));
+    }
     return groups;
 }
 
 bool matches(const UserEntry& user, const UserFilter& filter) {
-    if ((user.source & filter.sources) == 0)
+    if ((user.source & filter.sources) == 0) {
         return false;
-    if (!filter.substring.empty() && !containsLetters(user.name, filter.substring))
+    }
+    if (!filter.substring.empty() && !containsLetters(user.name, filter.substring)) {
         return false;
-    if (filter.domain.empty())
+    }
+    if (filter.domain.empty()) {
         return true;
+    }
     const std::string_view name = user.name;
-    if (const std::size_t slash = name.find('\\'); slash != std::string_view::npos)
+    if (const std::size_t slash = name.find('\\'); slash != std::string_view::npos) {
         return sameLetters(name.substr(0, slash), filter.domain);
+    }
     const std::size_t at = name.rfind('@');
     return at != std::string_view::npos && sameLetters(name.substr(at + 1), filter.domain);
 }

@@ -53,8 +53,9 @@ LogDatabase* currentDatabase(Connection& open) {
 int store(LogEntry& entry) {
     const std::optional<LogRetention> retention = loadRetention();
     // Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
-    if (!retention)
+    if (!retention) {
         syslog(LOG_WARNING, "administrator log: nothing is removed: %s", lastErrorSentence().c_str());
+    }
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);
     LogDatabase* database = currentDatabase(open);
@@ -67,8 +68,9 @@ LogEntry makeEntry(int category, int level, unsigned event, const std::array<con
     entry.category = category;
     entry.level = level;
     entry.event = event;
-    for (std::size_t i = 0; i < texts.size(); ++i)
+    for (std::size_t i = 0; i < texts.size(); ++i) {
         entry.texts[i] = plainText(texts[i] == nullptr ? "" : texts[i], longestText);
+    }
     entry.sentence = sentenceOf(event, entry.texts);
     entry.actor = plainText(requestActor().actor, longestActor);
     entry.address = plainText(requestActor().address, longestActor);
@@ -95,8 +97,9 @@ int VELTLogSet1(int category, int level, unsigned event, const char* arg1, const
     return velt::atBoundary([&] {
         velt::LogEntry entry = velt::makeEntry(category, level, event, {arg1, arg2, arg3, arg4});
         return velt::perform(velt::Effect::logEntry, entry.sentence, [&entry] {
-            if (velt::store(entry) < 0)
+            if (velt::store(entry) < 0) {
                 return -1;
+            }
             velt::publish(entry);
             return 0;
         });

@@ -39,8 +39,9 @@ std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4
     std::string sentence = std::string("Event ") + number;
     const char* separator = ": ";
     for (const std::string& text : texts) {
-        if (text.empty())
+        if (text.empty()) {
             continue;
+        }
         sentence += separator + text;
         separator = ", ";
     }
@@ -57,8 +58,9 @@ std::string sentenceOf(std::uint32_t event, const std::array<std::string, 4>& te
     const auto* const known =
         std::find_if(entries.begin(), entries.end(),
                      [event](const CatalogueEntry& entry) { return entry.event == event; });
-    if (known == entries.end())
+    if (known == entries.end()) {
         return unknownSentence(event, texts);
+    }
     std::string sentence;
     std::string_view rest = known->sentence;
     while (!rest.empty()) {

@@ -61,8 +61,9 @@ int switchToWal(sqlite3* database) {
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(busyMilliseconds);
     for (;;) {
         const int result = execute(database, "PRAGMA journal_mode = WAL");
-        if (result != SQLITE_BUSY || std::chrono::steady_clock::now() > deadline)
+        if (result != SQLITE_BUSY || std::chrono::steady_clock::now() > deadline) {
             return result;
+        }
         std::this_thread::sleep_for(std::chrono::milliseconds(2));
     }
 }
@@ -72,9 +73,10 @@ int makeFile(const std::filesystem::path& path) {
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
     const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
-    if (!fd)
+    if (!fd) {
         return fail(ErrorNumber::log, "The administrator log " + path.string() +
                                           " cannot be opened: " + std::strerror(errno) + ".");
+    }
     return 0;
 }
 
@@ -107,8 +109,9 @@ int LogDatabase::failHere(const char* what) const {
 }
 
 std::unique_ptr<LogDatabase> LogDatabase::open(const std::filesystem::path& path) {
-    if (makeFile(path) < 0)
+    if (makeFile(path) < 0) {
         return nullptr;
+    }
     std::unique_ptr<LogDatabase> log(new LogDatabase(path));
     const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
     if (sqlite3_open_v2(path.c_str(), &log->database_, flags, nullptr) != SQLITE_OK) {
@@ -122,25 +125,31 @@ int LogDatabase::prepare() {
     sqlite3_busy_timeout(database_, busyMilliseconds);
     // With the log ahead of the table, a commit that is not forced to the disk survives the end of the process; a
     // power failure may take the last entries, never the table's form.
-    if (switchToWal(database_) != SQLITE_OK || execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK)
+    if (switchToWal(database_) != SQLITE_OK ||
+        execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
         return failHere("opened");
+    }
     return makeTable() < 0 ? -1 : prepareStatements();
 }
 
 int LogDatabase::makeTable() {
     // Under the write lock, or two processes could both see that there is no table yet.
-    if (execute(database_, "BEGIN IMMEDIATE") != SQLITE_OK)
+    if (execute(database_, "BEGIN IMMEDIATE") != SQLITE_OK) {
         return failHere("opened");
+    }
     Statement version;
-    if (version.prepare(database_, "PRAGMA user_version") != SQLITE_OK || version.step() != SQLITE_ROW)
+    if (version.prepare(database_, "PRAGMA user_version") != SQLITE_OK || version.step() != SQLITE_ROW) {
         return failHere("opened");
+    }
     const std::int64_t found = version.number(0);
     version.reset();
-    if (found != 0 && found != formVersion)
+    if (found != 0 && found != formVersion) {
         return fail(ErrorNumber::log, "The administrator log " + path_.string() + " has form " +
                                           std::to_string(found) + ", which this version does not know.");
-    if (found == 0 && execute(database_, tableSql) != SQLITE_OK)
+    }
+    if (found == 0 && execute(database_, tableSql) != SQLITE_OK) {
         return failHere("made");
+    }
     return execute(database_, "COMMIT") == SQLITE_OK ? 0 : failHere("made");
 }
 
@@ -153,8 +162,9 @@ int LogDatabase::prepareStatements() {
         prepared(statements_->insert, insertSql) &&
         prepared(statements_->removeByCount, "DELETE FROM entry WHERE id <= ?1") &&
         prepared(statements_->removeByAge, "DELETE FROM entry WHERE time < ?1") &&
-        prepared(statements_->query, querySql))
+        prepared(statements_->query, querySql)) {
         return 0;
+    }
     return failHere("used");
 }
 
@@ -169,18 +179,23 @@ bool LogDatabase::leadsTo(const std::filesystem::path& path) const {
 }
 
 int LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& retention) {
-    if (statements_->begin.run() != SQLITE_DONE)
+    if (statements_->begin.run() != SQLITE_DONE) {
         return failHere("written");
+    }
     int result = insert(entry);
-    if (result == SQLITE_DONE && retention)
+    if (result == SQLITE_DONE && retention) {
         result = removeOld(entry, *retention);
-    if (result == SQLITE_DONE)
+    }
+    if (result == SQLITE_DONE) {
         result = statements_->commit.run();
-    if (result == SQLITE_DONE)
+    }
+    if (result == SQLITE_DONE) {
         return 0;
+    }
     failHere("written");
-    if (sqlite3_get_autocommit(database_) == 0)
+    if (sqlite3_get_autocommit(database_) == 0) {
         execute(database_, "ROLLBACK");
+    }
     return -1;
 }
 
@@ -190,8 +205,9 @@ int LogDatabase::insert(LogEntry& entry) {
     insert.bind(2, entry.category);
     insert.bind(3, entry.level);
     insert.bind(4, std::int64_t{entry.event});
-    for (int i = 0; i < 4; ++i)
+    for (int i = 0; i < 4; ++i) {
         insert.bind(5 + i, entry.texts[static_cast<std::size_t>(i)]);
+    }
     insert.bind(9, entry.sentence);
     insert.bind(10, entry.actor);
     insert.bind(11, entry.address);
@@ -203,8 +219,9 @@ int LogDatabase::insert(LogEntry& entry) {
 int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention) {
     if (retention.maxEntries > 0) {
         statements_->removeByCount.bind(1, newest.id - retention.maxEntries);
-        if (const int result = statements_->removeByCount.run(); result != SQLITE_DONE)
+        if (const int result = statements_->removeByCount.run(); result != SQLITE_DONE) {
             return result;
+        }
     }
     if (retention.maxAgeDays > 0) {
         statements_->removeByAge.bind(1,
@@ -230,14 +247,16 @@ std::optional<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter)
         entry.category = static_cast<int>(query.number(2));
         entry.level = static_cast<int>(query.number(3));
         entry.event = static_cast<unsigned>(query.number(4));
-        for (int i = 0; i < 4; ++i)
+        for (int i = 0; i < 4; ++i) {
             entry.texts[static_cast<std::size_t>(i)] = query.text(5 + i);
+        }
         entry.sentence = query.text(9);
         entry.actor = query.text(10);
         entry.address = query.text(11);
     }
-    if (result != SQLITE_DONE)
+    if (result != SQLITE_DONE) {
         failHere("read");
+    }
     query.reset();
     return result == SQLITE_DONE ? std::optional(std::move(entries)) : std::nullopt;
 }

@@ -12,16 +12,18 @@ void Statement::bind(int parameter, const std::string& text) {
 
 int Statement::run() {
     int result = SQLITE_ROW;
-    while (result == SQLITE_ROW)
+    while (result == SQLITE_ROW) {
         result = step();
+    }
     reset();
     return result;
 }
 
 std::string Statement::text(int column) {
     const auto* const text = sqlite3_column_text(statement_, column);
-    if (text == nullptr)
+    if (text == nullptr) {
         return {};
+    }
     return {reinterpret_cast<const char*>(text),
             static_cast<std::size_t>(sqlite3_column_bytes(statement_, column))};
 }

@@ -24,10 +24,11 @@ public:
     void bind(int parameter, std::int64_t number) { sqlite3_bind_int64(statement_, parameter, number); }
     void bind(int parameter, const std::string& text);
     template<class Value> void bind(int parameter, const std::optional<Value>& value) {
-        if (value)
+        if (value) {
             bind(parameter, *value);
-        else
+        } else {
             sqlite3_bind_null(statement_, parameter);
+        }
     }
 
     /// SQLITE_ROW, SQLITE_DONE, or what went wrong.

@@ -32,8 +32,9 @@ public:
         {
             const std::lock_guard lock(mutex_);
             const auto found = subscribers_.find(subscription);
-            if (found == subscribers_.end())
+            if (found == subscribers_.end()) {
                 return;
+            }
             subscriber = std::move(found->second);
             subscribers_.erase(found);
         }
@@ -49,8 +50,9 @@ public:
         }
         for (const auto& [subscription, subscriber] : subscribers) {
             const std::lock_guard lock(subscriber->mutex);
-            if (!subscriber->ended)
+            if (!subscriber->ended) {
                 call(*subscriber, message);
+            }
         }
     }
 

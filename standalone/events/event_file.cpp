@@ -41,15 +41,18 @@ int failToWrite(const std::filesystem::path& path, const char* why) {
 /// A line that does not fit on the disk is taken back, or the next one would be lost with it. The lock keeps other
 /// writers from adding theirs in between.
 int writeLine(int fd, const std::string& line, const std::filesystem::path& path) {
-    if (flock(fd, LOCK_EX) != 0)
+    if (flock(fd, LOCK_EX) != 0) {
         return failToWrite(path, std::strerror(errno));
+    }
     const off_t before = lseek(fd, 0, SEEK_END);
     const ssize_t written = write(fd, line.data(), line.size());
-    if (written == static_cast<ssize_t>(line.size()))
+    if (written == static_cast<ssize_t>(line.size())) {
         return 0;
+    }
     const int error = written < 0 ? errno : ENOSPC;
-    if (before >= 0 && ftruncate(fd, before) != 0)
+    if (before >= 0 && ftruncate(fd, before) != 0) {
         return failToWrite(path, "half a line is left in it");
+    }
     return failToWrite(path, std::strerror(error));
 }
 
@@ -57,8 +60,9 @@ int writeLine(int fd, const std::string& line, const std::filesystem::path& path
 
 std::string renderEvent(const SystemEvent& event) {
     Json::Value parameters(Json::objectValue);
-    for (const auto& [key, value] : event.parameters)
+    for (const auto& [key, value] : event.parameters) {
         parameters[key] = value;
+    }
     Json::Value line(Json::objectValue);
     line["time"] = renderTime(event.time);
     line["event"] = event.name;
@@ -74,8 +78,9 @@ std::string renderEvent(const SystemEvent& event) {
 int appendEvent(const SystemEvent& event) {
     const std::filesystem::path path = statePath("/var/log/velt/events.jsonl");
     const std::string line = renderEvent(event) + "\n";
-    if (line.size() > longestLine)
+    if (line.size() > longestLine) {
         return failToWrite(path, "it is longer than 64 KiB");
+    }
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
     // Opened anew each time, so that the lines that follow a rotation go to the new file.

@@ -12,13 +12,15 @@
 
 int VLIBSyseventEmit(const char* event, VLIBCSzHash* params, int /*flags*/) {
     return velt::atBoundary([&] {
-        if (event == nullptr || *event == '\0')
+        if (event == nullptr || *event == '\0') {
             return velt::fail(velt::ErrorNumber::invalid, "A system event needs a name.");
+        }
         velt::SystemEvent announced;
         announced.time = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
         announced.name = event;
-        if (params != nullptr)
+        if (params != nullptr) {
             announced.parameters = params->entries;
+        }
         announced.actor = velt::requestActor().actor;
         announced.address = velt::requestActor().address;
         return velt::perform(velt::Effect::event, announced.name, [&announced] {

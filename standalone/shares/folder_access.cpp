@@ -29,16 +29,20 @@ bool takeIdentity(uid_t uid, const std::vector<gid_t>& gids) {
 
 /// Runs in the child, where only system calls are safe.
 unsigned char askKernel(const char* path, uid_t uid, const std::vector<gid_t>& gids, bool changeIdentity) {
-    if (changeIdentity && !takeIdentity(uid, gids))
+    if (changeIdentity && !takeIdentity(uid, gids)) {
         return answerFailed;
+    }
     struct stat status {};
-    if (stat(path, &status) != 0 || !S_ISDIR(status.st_mode))
+    if (stat(path, &status) != 0 || !S_ISDIR(status.st_mode)) {
         return 0;
+    }
     unsigned char answer = 0;
-    if (access(path, R_OK | X_OK) == 0)
+    if (access(path, R_OK | X_OK) == 0) {
         answer |= answerRead;
-    if (access(path, W_OK | X_OK) == 0)
+    }
+    if (access(path, W_OK | X_OK) == 0) {
         answer |= answerWrite;
+    }
     return answer;
 }
 
@@ -56,13 +60,16 @@ std::optional<FolderAccess> cannotAsk(const std::string& path, const char* why) 
 
 std::optional<FolderAccess> folderAccess(const std::string& path, uid_t uid, const std::vector<gid_t>& gids) {
     const bool changeIdentity = geteuid() == 0;
-    if (!changeIdentity && uid != geteuid())
+    if (!changeIdentity && uid != geteuid()) {
         return cannotAsk(path, "only root can take another account's identity");
-    if (gids.empty())
+    }
+    if (gids.empty()) {
         return cannotAsk(path, "the account has no group");
+    }
     int ends[2];
-    if (pipe2(ends, O_CLOEXEC) != 0)
+    if (pipe2(ends, O_CLOEXEC) != 0) {
         return cannotAsk(path, std::strerror(errno));
+    }
     const pid_t child = fork();
     if (child == 0) {
         const unsigned char answer = askKernel(path.c_str(), uid, gids, changeIdentity);
@@ -74,16 +81,18 @@ std::optional<FolderAccess> folderAccess(const std::string& path, uid_t uid, con
     unsigned char answer = answerFailed;
     ssize_t got = -1;
     if (child > 0) {
-        do
+        do {
             got = read(ends[0], &answer, 1);
-        while (got < 0 && errno == EINTR);
+        } while (got < 0 && errno == EINTR);
         reap(child);
     }
     close(ends[0]);
-    if (child < 0)
+    if (child < 0) {
         return cannotAsk(path, std::strerror(forkError));
-    if (got != 1 || answer == answerFailed)
+    }
+    if (got != 1 || answer == answerFailed) {
         return cannotAsk(path, "the account's identity cannot be taken");
+    }
     const bool read = (answer & answerRead) != 0;
     return FolderAccess{read, read && (answer & answerWrite) != 0};
 }

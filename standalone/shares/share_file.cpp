@@ -33,50 +33,59 @@ class Flaw : public std::runtime_error {
 };
 
 void requireOnlyKeys(const Json::Value& object, std::initializer_list<std::string_view> known) {
-    for (const std::string& key : object.getMemberNames())
-        if (std::find(known.begin(), known.end(), key) == known.end())
+    for (const std::string& key : object.getMemberNames()) {
+        if (std::find(known.begin(), known.end(), key) == known.end()) {
             throw Flaw("has the unknown key \"" + plainText(key, 80) + "\"");
+        }
+    }
 }
 
 std::string textAt(const Json::Value& object, const char* key) {
-    if (!object[key].isString())
+    if (!object[key].isString()) {
         throw Flaw("has no text \"" + std::string(key) + "\"");
+    }
     return object[key].asString();
 }
 
 std::map<std::string, ShareGrant> grantsAt(const Json::Value& object, const char* key) {
     std::map<std::string, ShareGrant> grants;
-    if (!object.isMember(key))
+    if (!object.isMember(key)) {
         return grants;
+    }
     const Json::Value& entries = object[key];
-    if (!entries.isObject())
+    if (!entries.isObject()) {
         throw Flaw("has \"" + std::string(key) + "\" that is no object");
+    }
     for (const std::string& account : entries.getMemberNames()) {
         const Json::Value& value = entries[account];
         const auto* const word =
             std::find_if(grantWords.begin(), grantWords.end(), [&value](const GrantWord& known) {
                 return value.isString() && value == known.word;
             });
-        if (word == grantWords.end())
+        if (word == grantWords.end()) {
             throw Flaw("grants \"" + plainText(account, 80) +
                        "\" something other than \"none\", \"read\" or \"write\"");
+        }
         grants.emplace(account, word->grant);
     }
     return grants;
 }
 
 ShareEntry shareOf(const Json::Value& object) {
-    if (!object.isObject())
+    if (!object.isObject()) {
         throw Flaw("is no object");
+    }
     requireOnlyKeys(object, {"name", "comment", "path", "ftp", "users", "groups"});
     ShareEntry share;
     share.name = textAt(object, "name");
     share.path = textAt(object, "path");
-    if (object.isMember("comment"))
+    if (object.isMember("comment")) {
         share.comment = textAt(object, "comment");
+    }
     if (object.isMember("ftp")) {
-        if (!object["ftp"].isBool())
+        if (!object["ftp"].isBool()) {
             throw Flaw("has \"ftp\" that is neither true nor false");
+        }
         share.offeredToFtp = object["ftp"].asBool();
     }
     share.users = grantsAt(object, "users");
@@ -85,15 +94,20 @@ ShareEntry shareOf(const Json::Value& object) {
 }
 
 std::vector<ShareEntry> sharesOf(const Json::Value& root) {
-    if (!root.isObject())
+    if (!root.isObject()) {
         throw Flaw("the file is no object");
-    if (!root["version"].isInt() || root["version"].asInt() != formVersion)
+    }
+    if (!root["version"].isInt() || root["version"].asInt() != formVersion) {
         throw Flaw("\"version\" is not 1");
-    if (!root["shares"].isArray())
+    }
+    if (!root["shares"].isArray()) {
         throw Flaw("\"shares\" is no array");
-    for (const std::string& key : root.getMemberNames())
-        if (key != "version" && key != "shares")
+    }
+    for (const std::string& key : root.getMemberNames()) {
+        if (key != "version" && key != "shares") {
             throw Flaw("the unknown key \"" + plainText(key, 80) + "\"");
+        }
+    }
     std::vector<ShareEntry> shares;
     for (Json::ArrayIndex i = 0; i < root["shares"].size(); ++i) {
         try {
@@ -102,8 +116,9 @@ std::vector<ShareEntry> sharesOf(const Json::Value& root) {
             throw Flaw("share " + std::to_string(i + 1) + " " + flaw.what());
         }
     }
-    if (const std::optional<std::string> flaw = flawOf(shares))
+    if (const std::optional<std::string> flaw = flawOf(shares)) {
         throw Flaw(*flaw);
+    }
     return shares;
 }
 
@@ -122,8 +137,9 @@ Json::Value parseJson(std::string_view text) {
 
 Json::Value grantsValue(const std::map<std::string, ShareGrant>& grants) {
     Json::Value object(Json::objectValue);
-    for (const auto& [account, grant] : grants)
+    for (const auto& [account, grant] : grants) {
         object[account] = grantWords[static_cast<std::size_t>(grant)].word;
+    }
     return object;
 }
 

@@ -21,10 +21,12 @@ std::optional<ShareGrant> grantOfGroups(const ShareEntry& share, const std::vect
     std::optional<ShareGrant> best;
     for (const auto& [name, grant] : share.groups) {
         const std::optional<GroupEntry> group = groupByName(name);
-        if (!group || std::find(gids.begin(), gids.end(), group->gid) == gids.end())
+        if (!group || std::find(gids.begin(), gids.end(), group->gid) == gids.end()) {
             continue;
-        if (grant == ShareGrant::none)
+        }
+        if (grant == ShareGrant::none) {
             return grant;
+        }
         best = best ? std::max(*best, grant) : grant;
     }
     return best;
@@ -52,15 +54,19 @@ std::optional<Identity> identify(const ShareEntry& share, const std::string& acc
 std::optional<SharePrivilege> privilegeOn(const ShareEntry& share, const std::string& account) {
     std::optional<ShareGrant> grant;
     const std::optional<Identity> identity = identify(share, account, grant);
-    if (!identity || !grant)
+    if (!identity || !grant) {
         return SharePrivilege::none;
-    if (*grant == ShareGrant::none)
+    }
+    if (*grant == ShareGrant::none) {
         return SharePrivilege::denied;
+    }
     const std::optional<FolderAccess> allowed = folderAccess(share.path, identity->uid, identity->gids);
-    if (!allowed)
+    if (!allowed) {
         return std::nullopt;
-    if (!allowed->read)
+    }
+    if (!allowed->read) {
         return SharePrivilege::denied;
+    }
     return *grant == ShareGrant::write && allowed->write ? SharePrivilege::readWrite
                                                          : SharePrivilege::readOnly;
 }

@@ -32,16 +32,18 @@ Cache& cache() {
 
 std::optional<std::vector<ShareEntry>> readShares(const std::filesystem::path& path) {
     const std::optional<std::string> text = readFile(path);
-    if (!text && errno == ENOENT)
+    if (!text && errno == ENOENT) {
         return std::vector<ShareEntry>{};
+    }
     if (!text) {
         fail(ErrorNumber::store, path.string() + " cannot be read: " + std::strerror(errno) + ".");
         return std::nullopt;
     }
     std::string flaw;
     std::optional<std::vector<ShareEntry>> shares = parseShares(*text, flaw);
-    if (!shares)
+    if (!shares) {
         fail(ErrorNumber::damaged, path.string() + " is damaged: " + flaw + ".");
+    }
     return shares;
 }
 
@@ -52,8 +54,9 @@ std::optional<std::vector<ShareEntry>> allShares() {
     Cache& known = cache();
     const std::lock_guard lock(known.mutex);
     const FileStamp stamp = FileStamp::of(path);
-    if (path == known.path && stamp == known.stamp)
+    if (path == known.path && stamp == known.stamp) {
         return known.shares;
+    }
     std::optional<std::vector<ShareEntry>> shares = readShares(path);
     if (shares) {
         known.path = path;
@@ -64,11 +67,13 @@ std::optional<std::vector<ShareEntry>> allShares() {
 }
 
 int saveShares(const std::vector<ShareEntry>& shares) {
-    if (const std::optional<std::string> flaw = flawOf(shares))
+    if (const std::optional<std::string> flaw = flawOf(shares)) {
         return fail(ErrorNumber::invalid, "The shares cannot be stored: " + *flaw + ".");
+    }
     const StateLock lock;
-    if (!lock)
+    if (!lock) {
         return -1;
+    }
     return perform(Effect::store, "shares",
                    [&shares] { return replaceFile(statePath(shareFile), renderShares(shares), 0644); });
 }

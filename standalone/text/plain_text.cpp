@@ -29,10 +29,12 @@ constexpr std::array<Form, 4> forms{{
 }};
 
 bool isPlain(std::uint32_t code) {
-    if (code < 0x20 || (code >= 0x7F && code < 0xA0))
+    if (code < 0x20 || (code >= 0x7F && code < 0xA0)) {
         return false;
-    if (code == 0x2028 || code == 0x2029)
+    }
+    if (code == 0x2028 || code == 0x2029) {
         return false;
+    }
     return code <= 0x10FFFF && (code < 0xD800 || code > 0xDFFF);
 }
 
@@ -43,14 +45,17 @@ unsigned byteAt(std::string_view text, std::size_t index) {
 /// The first character of a text that is not empty.
 Character firstOf(std::string_view text) {
     for (const Form& form : forms) {
-        if ((byteAt(text, 0) & form.mask) != form.lead)
+        if ((byteAt(text, 0) & form.mask) != form.lead) {
             continue;
-        if (text.size() < form.length)
+        }
+        if (text.size() < form.length) {
             return {};
+        }
         std::uint32_t code = byteAt(text, 0) & ~form.mask;
         for (std::size_t i = 1; i < form.length; ++i) {
-            if ((byteAt(text, i) & 0xC0) != 0x80)
+            if ((byteAt(text, i) & 0xC0) != 0x80) {
                 return {};
+            }
             code = (code << 6) | (byteAt(text, i) & 0x3F);
         }
         return code < form.least ? Character{} : Character{form.length, isPlain(code)};
@@ -63,8 +68,9 @@ Character firstOf(std::string_view text) {
 bool isPlainText(std::string_view text) {
     while (!text.empty()) {
         const Character character = firstOf(text);
-        if (!character.plain)
+        if (!character.plain) {
             return false;
+        }
         text.remove_prefix(character.length);
     }
     return true;
@@ -76,8 +82,9 @@ std::string plainText(std::string_view text, std::size_t limit) {
     while (!text.empty()) {
         const Character character = firstOf(text);
         const std::string_view piece = character.plain ? text.substr(0, character.length) : replacement;
-        if (plain.size() + ellipsis.size() <= limit)
+        if (plain.size() + ellipsis.size() <= limit) {
             lastCut = plain.size();
+        }
         if (plain.size() + piece.size() > limit) {
             plain.resize(lastCut);
             return plain.append(ellipsis);

@@ -33,8 +33,9 @@ TEST(ParsePasswd, SkipsWhatIsNoUser) {
                                  ":x:1:1:::",
                                  "a:x:99999999999:1:::",
                                  "a:x:1:1::::extra"};
-    for (const char* line : lines)
+    for (const char* line : lines) {
         EXPECT_TRUE(parsePasswd(std::string(line) + "\n").empty()) << line;
+    }
 }
 
 TEST(ParsePasswd, KeepsBytesThatAreNoUtf8) {

@@ -27,12 +27,13 @@ bool isDomain() {
 }
 
 FakeUser userAt(std::size_t index) {
-    if (isDomain())
+    if (isDomain()) {
         return {index == 0   ? "OFFICE\\anna"
                 : index == 1 ? "LAB\\anna"
                              : "shared",
                 2'000'000U + unsigned(index),
                 "Anna of " + std::string(index == 0 ? "the office" : "the lab") + std::string(9000, ',')};
+    }
     return {index == 0   ? "berta@example.org"
             : index == 1 ? "shared"
                          : "local1",
@@ -94,29 +95,35 @@ nss_status ENTRY(FAKE_SOURCE, endpwent)() {
 }
 
 nss_status ENTRY(FAKE_SOURCE, getpwent_r)(passwd* record, char* buffer, std::size_t size, int* error) {
-    if (position == 3)
+    if (position == 3) {
         return NSS_STATUS_NOTFOUND;
+    }
     const nss_status status = fill(userAt(position), record, buffer, size, error);
-    if (status == NSS_STATUS_SUCCESS)
+    if (status == NSS_STATUS_SUCCESS) {
         ++position;
+    }
     return status;
 }
 
 nss_status ENTRY(FAKE_SOURCE, getpwnam_r)(const char* name, passwd* record, char* buffer, std::size_t size,
                                           int* error) {
-    for (std::size_t i = 0; i < 3; ++i)
-        if (userAt(i).name == name)
+    for (std::size_t i = 0; i < 3; ++i) {
+        if (userAt(i).name == name) {
             return fill(userAt(i), record, buffer, size, error);
+        }
+    }
     // Known to a look-up only, as with a source that does not enumerate.
-    if (name == std::string("quiet") && isDomain())
+    if (name == std::string("quiet") && isDomain()) {
         return fill({"quiet", 2'000'009, "Quiet One"}, record, buffer, size, error);
+    }
     return NSS_STATUS_NOTFOUND;
 }
 
 nss_status ENTRY(FAKE_SOURCE, getpwuid_r)(uid_t uid, passwd* record, char* buffer, std::size_t size,
                                           int* error) {
-    if (uid == 2'000'009 && isDomain())
+    if (uid == 2'000'009 && isDomain()) {
         return fill({"quiet", uid, "Quiet One"}, record, buffer, size, error);
+    }
     return NSS_STATUS_NOTFOUND;
 }
 

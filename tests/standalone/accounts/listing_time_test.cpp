@@ -36,15 +36,18 @@ std::string passwdOf(int count) {
 Milliseconds timeOfPage(std::string_view substring, std::size_t& total) {
     const auto start = std::chrono::steady_clock::now();
     std::vector<std::string> names;
-    for (const UserEntry& user : *allUsers())
-        if (matches(user, {sourceLocal, substring, ""}))
+    for (const UserEntry& user : *allUsers()) {
+        if (matches(user, {sourceLocal, substring, ""})) {
             names.push_back(user.name);
+        }
+    }
     total = names.size();
     std::size_t described = 0;
     for (std::size_t i = names.size() / 2; i < names.size() && i < names.size() / 2 + 50; ++i) {
         SDK::User* user = SDK::User::LoadUser(names[i]);
-        if (user == nullptr)
+        if (user == nullptr) {
             continue;
+        }
         described += user->GetDesc().empty() ? 0U : 1U;
         SDK::User::Release(user);
     }

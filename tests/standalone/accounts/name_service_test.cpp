@@ -25,8 +25,9 @@ protected:
 
     std::vector<std::string> listing() {
         std::vector<std::string> lines;
-        for (const UserEntry& user : *allUsers())
+        for (const UserEntry& user : *allUsers()) {
             lines.push_back(user.name + " " + std::to_string(user.source));
+        }
         return lines;
     }
 

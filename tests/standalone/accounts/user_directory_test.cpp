@@ -13,8 +13,9 @@ namespace {
 
 std::vector<std::string> namesOf(const std::vector<UserEntry>& users) {
     std::vector<std::string> names;
-    for (const UserEntry& user : users)
+    for (const UserEntry& user : users) {
         names.push_back(user.name);
+    }
     return names;
 }
 
@@ -59,8 +60,9 @@ TEST_F(UserDirectoryTest, FindsSystemAccountsThoughTheyAreNotListed) {
 }
 
 TEST_F(UserDirectoryTest, DoesNotTakeAPrefixOrOddTextForAName) {
-    for (const std::string name : {"ann", "ANNA", "anna\n", "anna:x", "", "\xff", "../anna"})
+    for (const std::string name : {"ann", "ANNA", "anna\n", "anna:x", "", "\xff", "../anna"}) {
         EXPECT_FALSE(userByName(name)) << name;
+    }
     EXPECT_FALSE(userByName(std::string("anna\0", 5)));
 }
 
@@ -121,22 +123,25 @@ TEST_F(UserDirectoryTest, ServesManyThreadsWhileTheFileChanges) {
     std::atomic<bool> done = false;
     std::atomic<int> wrong = 0;
     std::vector<std::thread> readers;
-    for (int i = 0; i < 4; ++i)
+    for (int i = 0; i < 4; ++i) {
         readers.emplace_back([&] {
             while (!done) {
                 const auto users = allUsers();
-                if (users->size() != 1 && users->size() != 2)
+                if (users->size() != 1 && users->size() != 2) {
                     ++wrong;
+                }
                 userByName("anna");
             }
         });
+    }
     for (int round = 0; round < 200; ++round) {
         folder_.write("new", round % 2 == 0 ? "a:x:1000:1:::\n" : "a:x:1000:1:::\nb:x:1001:1:::\n");
         std::filesystem::rename(folder_.path() / "new", folder_.path() / "passwd");
     }
     done = true;
-    for (std::thread& reader : readers)
+    for (std::thread& reader : readers) {
         reader.join();
+    }
     EXPECT_EQ(wrong, 0);
 }
 

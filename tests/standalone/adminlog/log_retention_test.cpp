@@ -24,8 +24,9 @@ protected:
         const auto entries = queryLog({{}, {}, {}, {}, 1000});
         EXPECT_TRUE(entries) << lastErrorSentence();
         std::vector<std::string> texts;
-        for (const LogEntry& entry : entries.value_or(std::vector<LogEntry>{}))
+        for (const LogEntry& entry : entries.value_or(std::vector<LogEntry>{})) {
             texts.push_back(entry.texts[0]);
+        }
         return texts;
     }
 
@@ -72,14 +73,16 @@ TEST(ParseRetention, NamesTheLineThatItCannotRead) {
 
 TEST_F(LogRetentionTest, KeepsTheNewestByCount) {
     folder_.write("/etc/velt/log.conf", "max_entries=3\n");
-    for (const char* text : {"1", "2", "3", "4", "5"})
+    for (const char* text : {"1", "2", "3", "4", "5"}) {
         log(text);
+    }
     EXPECT_EQ(texts(), (Lines{"5", "4", "3"}));
 }
 
 TEST_F(LogRetentionTest, TakesUpAChangedCountAtTheNextEntry) {
-    for (const char* text : {"1", "2", "3"})
+    for (const char* text : {"1", "2", "3"}) {
         log(text);
+    }
     folder_.write("/etc/velt/log.conf", "max_entries=2\n");
     log("4");
     EXPECT_EQ(texts(), (Lines{"4", "3"}));

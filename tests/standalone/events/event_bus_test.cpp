@@ -73,8 +73,9 @@ TEST(EventBus, ASubscriberMayCauseAFurtherEvent) {
     Names heard;
     const Subscription subscription = subscribeEvents([&](const SystemEvent& event) {
         heard.push_back(event.name);
-        if (event.name == "a")
+        if (event.name == "a") {
             publish(eventCalled("b"));
+        }
     });
     publish(eventCalled("a"));
     unsubscribe(subscription);
@@ -89,15 +90,17 @@ TEST(EventBus, IgnoresUnknownSubscriptions) {
 TEST(EventBus, NoCallRunsOnceASubscriptionHasEnded) {
     std::atomic<bool> done = false;
     std::thread announcer([&done] {
-        while (!done)
+        while (!done) {
             publish(eventCalled("a"));
+        }
     });
     std::atomic<int> late = 0;
     for (int round = 0; round < 300; ++round) {
         std::atomic<bool> ended = false;
         const Subscription subscription = subscribeEvents([&](const SystemEvent&) {
-            if (ended)
+            if (ended) {
                 ++late;
+            }
         });
         std::this_thread::yield();
         unsubscribe(subscription);

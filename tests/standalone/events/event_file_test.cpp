@@ -38,8 +38,9 @@ protected:
 
     static int emit(const std::string& name, const std::map<std::string, std::string>& parameters) {
         VLIBCSzHash* map = VLIBCSzHashAlloc(1024);
-        for (const auto& [key, value] : parameters)
+        for (const auto& [key, value] : parameters) {
             EXPECT_GE(VLIBCSzHashSetValue(&map, key.c_str(), value.c_str()), 0);
+        }
         const int result = VLIBSyseventEmit(name.c_str(), map, 1);
         VLIBCSzHashFree(map);
         return result;
@@ -119,8 +120,9 @@ TEST_F(EventFileTest, WhatIsNoUtf8IsReplaced) {
         ASSERT_EQ(emit("e", {{"k", text}}), 0);
         EXPECT_NE(lines().back()["parameters"]["k"].asString().find("\xEF\xBF\xBD"), std::string::npos);
     }
-    for (const char byte : folder_.read(file))
+    for (const char byte : folder_.read(file)) {
         EXPECT_GT(byte, 0) << "the file is ASCII";
+    }
 }
 
 TEST_F(EventFileTest, AnOverlongEventIsRefusedButHeard) {
@@ -189,21 +191,25 @@ TEST_F(EventFileTest, TakesBackALineThatDoesNotFit) {
 TEST_F(EventFileTest, LinesOfTwoProcessesNeverMix) {
     constexpr int each = 300;
     const auto emitAll = [](const std::string& name) {
-        for (int i = 0; i < each; ++i)
-            if (emit(name, {{"number", std::to_string(i)}, {"filler", std::string(5000, 'x')}}) != 0)
+        for (int i = 0; i < each; ++i) {
+            if (emit(name, {{"number", std::to_string(i)}, {"filler", std::string(5000, 'x')}}) != 0) {
                 return 1;
+            }
+        }
         return 0;
     };
     const pid_t child = fork();
-    if (child == 0)
+    if (child == 0) {
         _exit(emitAll("child"));
+    }
     EXPECT_EQ(emitAll("parent"), 0);
     int status = -1;
     ASSERT_EQ(waitpid(child, &status, 0), child);
     EXPECT_EQ(status, 0);
     std::map<std::string, int> next;
-    for (const Json::Value& line : lines())
+    for (const Json::Value& line : lines()) {
         EXPECT_EQ(line["parameters"]["number"].asString(), std::to_string(next[line["event"].asString()]++));
+    }
     EXPECT_EQ(next, (std::map<std::string, int>{{"child", each}, {"parent", each}}));
 }
 

@@ -8,21 +8,24 @@ namespace {
 using namespace std::string_literals;
 
 TEST(PlainText, AcceptsTextInAnyScript) {
-    for (const char* text : {"", "plain", "Ünïcode", "資料", "\xF0\x9F\x93\x81", "a b\"c'd\\e;f`g$h%i"})
+    for (const char* text : {"", "plain", "Ünïcode", "資料", "\xF0\x9F\x93\x81", "a b\"c'd\\e;f`g$h%i"}) {
         EXPECT_TRUE(isPlainText(text)) << text;
+    }
 }
 
 TEST(PlainText, RefusesControlCharactersAndLineEnds) {
     for (const std::string& text : {"a\nb"s, "a\rb"s, "\t"s, "a\0b"s, "\x1b[31m"s, "\x7f"s, "\xC2\x85"s,
-                                    "\xE2\x80\xA8"s, "\xE2\x80\xA9"s})
+                                    "\xE2\x80\xA8"s, "\xE2\x80\xA9"s}) {
         EXPECT_FALSE(isPlainText(text));
+    }
 }
 
 TEST(PlainText, RefusesWhatIsNoUtf8) {
     for (const std::string& text :
          {"\xff"s, "\x80"s, "\xC3"s, "\xC3("s, "\xE2\x82"s, "\xC0\xAF"s, "\xE0\x80\xAF"s, "\xED\xA0\x80"s,
-          "\xF4\x90\x80\x80"s, "\xF8\x88\x80\x80\x80"s})
+          "\xF4\x90\x80\x80"s, "\xF8\x88\x80\x80\x80"s}) {
         EXPECT_FALSE(isPlainText(text));
+    }
 }
 
 TEST(PlainText, ReplacesWhatIsNotPlain) {

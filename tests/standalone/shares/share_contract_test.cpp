@@ -23,8 +23,9 @@ protected:
 
     std::vector<std::string> listed() const {
         std::vector<std::string> names;
-        for (int i = 0; i < list_->count; ++i)
+        for (int i = 0; i < list_->count; ++i) {
             names.emplace_back(VLIBCSzListGet(list_, i));
+        }
         return names;
     }
 

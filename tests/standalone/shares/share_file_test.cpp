@@ -106,8 +106,9 @@ TEST(ShareFile, IsStrictJson) {
     for (const char* text : {R"({"version":1,"shares":[]} x)", R"(// c
 {"version":1,"shares":[]})",
                              R"({"version":1,"version":1,"shares":[]})", R"({"version":1,"shares":[],})",
-                             "{'version':1,'shares':[]}"})
+                             "{'version':1,'shares':[]}"}) {
         EXPECT_NE(flawIn(text).find("no valid JSON"), std::string::npos) << text;
+    }
     EXPECT_FALSE(flawIn(std::string(100'000, '[')).empty());
 }
 

@@ -29,8 +29,9 @@ constexpr gid_t mediaGid = 54333;
 class SharePrivilegeTest : public testing::Test {
 protected:
     void SetUp() override {
-        if (geteuid() != 0)
+        if (geteuid() != 0) {
             GTEST_SKIP() << "only root can take another account's identity";
+        }
         chmod(folder_.path().c_str(), 0755);
         AccountSources sources;
         sources.passwd = folder_.write("passwd", "ftp:x:54321:54331::/:/\nanna:x:54322:54331::/:/\n"
@@ -193,14 +194,18 @@ TEST_F(SharePrivilegeTest, LeavesTheCallersIdentityAloneAndServesManyThreads) {
     share_.users["anna"] = ShareGrant::write;
     std::atomic<int> wrong = 0;
     std::vector<std::thread> threads;
-    for (int i = 0; i < 4; ++i)
+    for (int i = 0; i < 4; ++i) {
         threads.emplace_back([&, i] {
-            for (int round = 0; round < 25; ++round)
-                if (privilegeOf(i % 2 == 0 ? "ftp" : "anna") != (i % 2 == 0 ? denied : readOnly))
+            for (int round = 0; round < 25; ++round) {
+                if (privilegeOf(i % 2 == 0 ? "ftp" : "anna") != (i % 2 == 0 ? denied : readOnly)) {
                     ++wrong;
+                }
+            }
         });
-    for (std::thread& thread : threads)
+    }
+    for (std::thread& thread : threads) {
         thread.join();
+    }
     EXPECT_EQ(wrong, 0);
     EXPECT_EQ(geteuid(), 0U);
 }

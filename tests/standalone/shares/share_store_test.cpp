@@ -99,17 +99,20 @@ TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
         for (int i = 0; i < each; ++i) {
             const StateLock lock;
             std::optional<std::vector<ShareEntry>> shares = allShares();
-            if (!lock || !shares)
+            if (!lock || !shares) {
                 return 1;
+            }
             shares->push_back(shareCalled(prefix + std::to_string(i)));
-            if (saveShares(*shares) < 0)
+            if (saveShares(*shares) < 0) {
                 return 2;
+            }
         }
         return 0;
     };
     const pid_t child = fork();
-    if (child == 0)
+    if (child == 0) {
         _exit(addAll("child"));
+    }
     ASSERT_GT(child, 0);
     EXPECT_EQ(addAll("parent"), 0);
     int status = -1;

@@ -16,8 +16,9 @@ class TemporaryFolder {
 public:
     TemporaryFolder() {
         std::string pattern = (std::filesystem::temp_directory_path() / "velt-test-XXXXXX").string();
-        if (mkdtemp(pattern.data()) == nullptr)
+        if (mkdtemp(pattern.data()) == nullptr) {
             throw std::runtime_error("cannot make a temporary folder");
+        }
         path_ = pattern;
     }
     ~TemporaryFolder() {
