@@ -8,7 +8,7 @@
 #include "conf.h"
 #include "privs.h"
 
-#include "rules.h"
+#include "standalone/mod_velt_chroot/rules.h"
 
 #include <sys/stat.h>
 

@@ -1,4 +1,4 @@
-#include "rules.h"
+#include "standalone/mod_velt_chroot/rules.h"
 
 #include <errno.h>
 #include <fcntl.h>
