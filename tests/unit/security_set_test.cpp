@@ -140,6 +140,14 @@ TEST_F(SecuritySetTest, ExchangesAShareThatIsGoneForOneThatCanBeReached) {
                restarted(0) + Lines{entry("0x11B00028", "public"), succeeded()}));
 }
 
+TEST_F(SecuritySetTest, ConfinesAnonymousUsersToAShareOfOneLetter) {
+    platform.shares["p"] = {"", "/volume1/p", 2};
+    EXPECT_EQ(run(FTPSecuritySet, R"({"anonymous_chroot":true,"anonymous_chroot_share":"p"})"),
+              (begun() + testedShare("p") +
+               Lines{stored(R"(anonymous_chroot_share: "p", anonymous_chroot: 1)")} + restarted(0) +
+               Lines{entry("0x11B00026", "started"), entry("0x11B00028", "p"), succeeded()}));
+}
+
 TEST_F(SecuritySetTest, WritesTheEntriesOfAllChangesInTheirOrder) {
     EXPECT_EQ(run(FTPSecuritySet, R"({"user_chroot":true,"anonymous":true,"anonymous_chroot":true,)"
                                   R"("anonymous_chroot_share":"public"})"),
