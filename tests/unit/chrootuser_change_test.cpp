@@ -31,7 +31,7 @@ std::string joined(const Lines& names, const std::string& separator) {
 }
 
 std::string push(const std::string& name) {
-    return "VLIBCSzListPush(list1, \"" + name + "\")";
+    return "VLIBCSzListPush(list1 flags=16, \"" + name + "\")";
 }
 
 std::string changed(const Method& method, const Lines& names) {
