@@ -128,8 +128,8 @@ TEST_F(FakeHandles, MovesAListThatGrows) {
     EXPECT_EQ(platform.handleErrors(), Lines{"VLIBCSzListFree(list1 (moved))"});
     EXPECT_EQ(platform.journal, (Lines{
                                     "VLIBCSzListAlloc(1024)",
-                                    R"(VLIBCSzListPush(list1, "a"))",
-                                    R"(VLIBCSzListPush(list1, "b"))",
+                                    R"(VLIBCSzListPush(list1 flags=16, "a"))",
+                                    R"(VLIBCSzListPush(list1 flags=16, "b"))",
                                     R"(VELTFTPAddChrootUser(list1 flags=16 ["a", "b"]))",
                                     "VLIBCSzListFree(list1)",
                                     "VLIBCSzListFree(list1 (moved))",

@@ -135,8 +135,9 @@ public:
     /// is no longer valid shows as "list1 (moved)" or "list1 (freed)".
     ///
     /// VELTFTPConfSet shows the fields that differ from the stored record. A list that is an input shows
-    /// as: list1 flags=16 ["a", "b"]. A syslog line shows the priority, the format, the source name and the
-    /// arguments after the line number; the number itself shows only when it is not positive.
+    /// as: list1 flags=16 ["a", "b"]; one that is pushed to shows its flags when they are not 0. A syslog
+    /// line shows the priority, the format, the source name and the arguments after the line number; the
+    /// number itself shows only when it is not positive.
     std::vector<std::string> journal;
 
     std::vector<LogLine> logLines;
