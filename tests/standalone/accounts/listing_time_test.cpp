@@ -17,9 +17,10 @@ using Milliseconds = std::chrono::duration<double, std::milli>;
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 constexpr double slowness = 20;
 #elif defined(__OPTIMIZE__)
-constexpr double slowness = 1;
+// The goals are for a machine that does nothing else; a test must not fail because others use it.
+constexpr double slowness = 3;
 #else
-constexpr double slowness = 5;
+constexpr double slowness = 10;
 #endif
 
 std::string passwdOf(int count) {
