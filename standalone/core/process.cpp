@@ -28,14 +28,6 @@ using Clock = std::chrono::steady_clock;
 
 constexpr std::size_t mostOutput = std::size_t{1} << 20;
 
-// Above the standard descriptors, even in a process that runs without them: the child's dup2 calls would
-// otherwise overwrite one end with another.
-UniqueFd aboveStandard(UniqueFd fd) {
-    if (!fd || fd.get() > STDERR_FILENO)
-        return fd;
-    return UniqueFd(::fcntl(fd.get(), F_DUPFD_CLOEXEC, STDERR_FILENO + 1));
-}
-
 struct Pipe {
     UniqueFd readEnd;
     UniqueFd writeEnd;
@@ -45,7 +37,7 @@ Pipe makePipe() {
     std::array<int, 2> ends{-1, -1};
     if (::pipe2(ends.data(), O_CLOEXEC) != 0)
         return {};
-    Pipe made{aboveStandard(UniqueFd(ends[0])), aboveStandard(UniqueFd(ends[1]))};
+    Pipe made{UniqueFd(ends[0]), UniqueFd(ends[1])};
     ::fcntl(made.readEnd.get(), F_SETFL, O_NONBLOCK);
     return made;
 }
@@ -53,7 +45,7 @@ Pipe makePipe() {
 // The input stands in a file in memory: nobody has to feed a pipe while reading two others, and a program
 // that opens /dev/stdin can do so.
 UniqueFd makeInput(std::string_view input) {
-    UniqueFd file = aboveStandard(UniqueFd(::memfd_create("input", MFD_CLOEXEC)));
+    UniqueFd file(::memfd_create("input", MFD_CLOEXEC));
     while (file && !input.empty()) {
         const ssize_t written = ::write(file.get(), input.data(), input.size());
         if (written < 0 && errno != EINTR)
@@ -98,6 +90,8 @@ public:
 
     int spawn(pid_t& pid, const std::string& program, const std::vector<std::string>& arguments,
               const std::array<int, 3>& standard) {
+        // In a process whose own standard descriptors are closed, these have their numbers. They were opened in
+        // this order, so that no dup2 overwrites one that is still to come.
         for (int i = 0; i < 3; ++i)
             ::posix_spawn_file_actions_adddup2(&actions_, standard[static_cast<std::size_t>(i)], i);
         ::posix_spawn_file_actions_addclosefrom_np(&actions_, STDERR_FILENO + 1);

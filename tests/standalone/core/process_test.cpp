@@ -94,17 +94,19 @@ TEST(RunProcess, PassesNoOtherDescriptorAndNoSignalChoice) {
 }
 
 TEST(RunProcess, WorksInAProcessWithoutStandardDescriptors) {
-    const pid_t child = ::fork();
-    if (child == 0) {
-        ::close(0);
-        ::close(1);
-        ::close(2);
-        const auto result = runProcess({"sh", "-c", "cat; echo err >&2"}, "in");
-        ::_exit(result.output == "in" && result.errors == "err\n" ? 0 : 1);
+    for (int closed = 0; closed < 8; ++closed) {
+        const pid_t child = ::fork();
+        if (child == 0) {
+            for (int fd = 0; fd < 3; ++fd)
+                if ((closed & (1 << fd)) != 0)
+                    ::close(fd);
+            const auto result = runProcess({"sh", "-c", "cat; echo err >&2"}, "in");
+            ::_exit(result.output == "in" && result.errors == "err\n" ? 0 : 1);
+        }
+        int status = -1;
+        ASSERT_EQ(::waitpid(child, &status, 0), child);
+        EXPECT_EQ(status, 0) << "without the descriptors of the mask " << closed;
     }
-    int status = -1;
-    ASSERT_EQ(::waitpid(child, &status, 0), child);
-    EXPECT_EQ(status, 0);
 }
 
 } // namespace
