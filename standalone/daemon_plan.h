@@ -1,0 +1,37 @@
+// How the stored settings become a running daemon: what to start, and what it stands for.
+#ifndef VELT_STANDALONE_DAEMON_PLAN_H
+#define VELT_STANDALONE_DAEMON_PLAN_H
+
+#include <filesystem>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace velt {
+
+/// One daemon, ready to be started in the foreground by its argument vector; it writes its reasons to standard error.
+struct DaemonPlan {
+    std::vector<std::string>
+        arguments; ///< arguments[0] is an absolute path; started with a clean environment
+    std::filesystem::path
+        executable;                ///< what runs in that process in the end (a wrapper replaces itself by it)
+    std::string configurationHash; ///< equal hashes: a running daemon need not be started anew
+    std::vector<int> listenPorts;  ///< TCP ports that the process listens on once it is ready
+};
+
+/// Renders, tests and writes the configuration that follows from the stored settings, and all that it needs: certificate or host
+/// keys, links, the map of shares. What a running daemon reads at logins is replaced atomically, the rest is read at its
+/// start only; so this may be called while the daemon runs. Nothing, with the last error set, when the settings cannot be
+/// read, enable neither FTP nor FTPS, or are refused by the daemon's own test. Thread-safe.
+std::optional<DaemonPlan> planFtpDaemon();
+
+/// The same for SFTP, whatever the stored enable flag says.
+std::optional<DaemonPlan> planSftpDaemon();
+
+/// Writes anew the map from share names to folders that the running FTP daemon consults at each login. To be called after the
+/// shares have changed. Negative on failure, with the last error set.
+int refreshShareMap();
+
+} // namespace velt
+
+#endif

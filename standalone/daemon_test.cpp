@@ -1,0 +1,69 @@
+#include "standalone/daemon_test.h"
+
+#include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
+#include "standalone/core/state_root.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <sstream>
+
+namespace velt {
+
+ScratchFolder::ScratchFolder() {
+    const auto parent = statePath("/run/velt");
+    std::error_code error;
+    std::filesystem::create_directories(parent, error);
+    std::string pattern = (parent / "test.XXXXXX").string();
+    if (mkdtemp(pattern.data()) == nullptr) {
+        fail(ErrorNumber::store,
+             "No folder can be made in " + parent.string() + ": " + std::strerror(errno) + ".");
+        return;
+    }
+    path_ = pattern;
+}
+
+ScratchFolder::~ScratchFolder() {
+    if (!path_.empty()) {
+        std::error_code error;
+        std::filesystem::remove_all(path_, error);
+    }
+}
+
+std::string lastWords(const std::string& errors) {
+    std::string words;
+    std::istringstream lines(errors);
+    for (std::string line; std::getline(lines, line);) {
+        // ProFTPD: "2026-01-31 12:00:00,123 host proftpd[42] host: fatal: ..."; what explains is the first such line.
+        if (const auto at = line.find(": fatal: "); at != std::string::npos) {
+            return line.substr(at + std::strlen(": fatal: "));
+        }
+        if (line.find_first_not_of(" \r\t") != std::string::npos) {
+            words = line;
+        }
+    }
+    if (const auto process = words.find(" proftpd["); process != std::string::npos) {
+        if (const auto colon = words.find(": ", process); colon != std::string::npos) {
+            words.erase(0, colon + 2);
+        }
+    }
+    while (!words.empty() && (words.back() == '\r' || words.back() == ' ' || words.back() == '.')) {
+        words.pop_back();
+    }
+    return words;
+}
+
+int runDaemonTest(const std::string& daemon, const std::vector<std::string>& arguments) {
+    const auto result = runProcess(arguments);
+    if (result.exitCode == 0) {
+        return 0;
+    }
+    std::string words = lastWords(result.errors);
+    if (words.empty()) {
+        words = "it ended with " + std::to_string(result.exitCode);
+    }
+    return fail(ErrorNumber::daemon, "The " + daemon + " daemon refuses its configuration: " + words + ".");
+}
+
+} // namespace velt

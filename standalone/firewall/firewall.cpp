@@ -1,0 +1,105 @@
+#include "platform/firewall.h"
+
+#include "standalone/core/boundary.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
+#include "standalone/core/state_root.h"
+#include "standalone/firewall/firewall_settings.h"
+#include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/ruleset.h"
+#include "standalone/settings/settings.h"
+
+#include <syslog.h>
+
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace velt {
+namespace {
+
+/// Stands while rules of ours are loaded; like these it is gone after a boot.
+std::filesystem::path loadedMark() {
+    return statePath("/run/velt/firewall.loaded");
+}
+
+/// For the administrator: why ports may be closed although we opened them.
+std::filesystem::path warningFile() {
+    return statePath("/run/velt/firewall.warning");
+}
+
+std::string firstLine(const std::string& text) {
+    return text.substr(0, text.find('\n'));
+}
+
+int failToLoad(const ProcessResult& result) {
+    const std::string reason = firstLine(result.errors);
+    if (reason.find("Operation not permitted") != std::string::npos) {
+        return fail(ErrorNumber::firewall,
+                    "The firewall rules are not loaded: this process may not administer the network.");
+    }
+    return fail(ErrorNumber::firewall, "The firewall rules are not loaded: " + reason + ".");
+}
+
+void warnOfForeignTables() {
+    const std::vector<std::string> chains =
+        foreignDropChains(runProcess({"nft", "--json", "list", "chains"}).output);
+    std::error_code ignored;
+    if (chains.empty()) {
+        std::filesystem::remove(warningFile(), ignored);
+        return;
+    }
+    std::string text;
+    for (const std::string& chain : chains) {
+        text += "The chain \"" + chain +
+                "\" of another firewall drops what it does not accept itself, so ports of the file-transfer "
+                "services may stay closed.\n";
+    }
+    ::syslog(LOG_WARNING, "%s", firstLine(text).c_str());
+    // The rules are in force by now: a note that cannot be left is no reason to call them failed.
+    if (replaceFile(warningFile(), text, 0644) < 0) {
+        ::syslog(LOG_WARNING, "%s", lastErrorSentence().c_str());
+    }
+}
+
+int loadRules() {
+    const auto firewall = loadFirewallSettings();
+    if (!firewall) {
+        return -1;
+    }
+    std::error_code ignored;
+    if (firewall->mode == FirewallMode::off && !std::filesystem::exists(loadedMark(), ignored)) {
+        return 0; // nothing to take away, and perhaps no right to do it
+    }
+    const auto ftp = loadFtpSettings();
+    const auto sftp = loadSftpSettings();
+    if (!ftp || !sftp) {
+        return -1;
+    }
+    // Before the rules, since a mark without rules does no harm.
+    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), "", 0644) < 0) {
+        return -1;
+    }
+    const ProcessResult result =
+        runProcess({"nft", "-f", "-"}, renderRuleset(*firewall, servicePorts(*ftp, *sftp)));
+    if (result.exitCode != 0) {
+        return failToLoad(result);
+    }
+    if (firewall->mode == FirewallMode::off) {
+        std::filesystem::remove(loadedMark(), ignored);
+        std::filesystem::remove(warningFile(), ignored);
+        return 0;
+    }
+    warnOfForeignTables();
+    return 0;
+}
+
+} // namespace
+} // namespace velt
+
+int VELTFwRuleHup(void) {
+    return velt::atBoundary(
+        [] { return velt::perform(velt::Effect::firewall, "firewall rules", velt::loadRules); });
+}

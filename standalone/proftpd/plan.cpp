@@ -1,0 +1,131 @@
+#include "standalone/daemon_plan.h"
+
+#include "standalone/chroot/rule_store.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/daemon_test.h"
+#include "standalone/installed_files.h"
+#include "standalone/proftpd/places.h"
+#include "standalone/proftpd/share_lists.h"
+#include "standalone/settings/candidate.h"
+#include "standalone/tls/digest.h"
+
+#include <cstdlib>
+
+namespace velt {
+namespace {
+
+constexpr const char* program = "/usr/sbin/proftpd";
+
+// The same text, but for the files that the daemon would write: its test writes some of them, too.
+int testRendering(const FtpSettings& settings, ProftpdPlaces places) {
+    const ScratchFolder scratch;
+    if (!scratch) {
+        return -1;
+    }
+    places.runFolder = scratch.path();
+    const auto configuration = scratch.path() / "proftpd.conf";
+    if (replaceFile(configuration, renderProftpd(settings, places), 0600) < 0) {
+        return -1;
+    }
+    return runDaemonTest("FTP", {program, "-t", "-c", configuration.string()});
+}
+
+int makeFolder(const std::filesystem::path& path) {
+    std::error_code error;
+    std::filesystem::create_directories(path, error);
+    if (!error) {
+        // Sessions walk through them as the user who logged in; nobody else may write there.
+        std::filesystem::permissions(path, std::filesystem::perms(0755), error);
+    }
+    return error ? fail(ErrorNumber::store,
+                        "The folder " + path.string() + " cannot be made: " + error.message() + ".")
+                 : 0;
+}
+
+int replaceLink(const std::filesystem::path& link, const std::filesystem::path& target) {
+    std::error_code error;
+    const auto next = std::filesystem::path(link.string() + ".new");
+    std::filesystem::remove(next, error);
+    if (target.empty()) {
+        std::filesystem::remove(link, error);
+    } else if (std::filesystem::create_symlink(target, next, error); !error) {
+        std::filesystem::rename(next, link, error);
+    }
+    return error ? fail(ErrorNumber::store,
+                        "The link " + link.string() + " cannot be made: " + error.message() + ".")
+                 : 0;
+}
+
+int writeSurroundings(const FtpSurroundings& found) {
+    const auto& places = found.places;
+    if (makeFolder(places.runFolder) < 0 || makeFolder(places.shareRoot) < 0 ||
+        makeFolder(places.anonymousLink.parent_path()) < 0 ||
+        replaceLink(places.anonymousLink, found.anonymousFolder) < 0 || makeRulesFile() < 0) {
+        return -1;
+    }
+    return refreshShareMap();
+}
+
+std::vector<std::string> argumentsOf(const FtpSettings& settings, const FtpSurroundings& found,
+                                     const std::filesystem::path& configuration,
+                                     const std::filesystem::path& mountList) {
+    std::vector<std::string> arguments;
+    if (needsShareRoot(settings) && !found.places.accountFiles) {
+        arguments = {installedFile("velt-share-root"), mountList, found.places.shareRoot};
+    }
+    // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
+    arguments.insert(arguments.end(), {program, "-n", "-c", configuration.string()});
+    return arguments;
+}
+
+std::optional<DaemonPlan> writePlan(const FtpSettings& settings, const FtpSurroundings& found) {
+    const auto configuration = found.places.runFolder / "proftpd.conf";
+    const auto mountList = found.places.runFolder / "mounts";
+    const std::string text = renderProftpd(settings, found.places);
+    if (writeSurroundings(found) < 0 || replaceFile(configuration, text, 0600) < 0 ||
+        replaceFile(mountList, found.mounts, 0600) < 0) {
+        return std::nullopt;
+    }
+    DaemonPlan plan;
+    plan.arguments = argumentsOf(settings, found, configuration, mountList);
+    plan.executable = program;
+    plan.listenPorts = {std::atoi(settings.record.portnum)};
+    std::string all = text + '\0' + found.mounts + '\0' + found.certificateFingerprint;
+    for (const auto& argument : plan.arguments) {
+        all += '\0' + argument;
+    }
+    plan.configurationHash = sha256(all);
+    return plan;
+}
+
+} // namespace
+
+int testFtpCandidate(const FtpSettings& settings) {
+    const auto found = surveyFtp(settings);
+    return found ? testRendering(settings, found->places) : -1;
+}
+
+std::optional<DaemonPlan> planFtpDaemon() {
+    const StateLock lock;
+    const auto settings = lock ? loadFtpSettings() : std::nullopt;
+    if (!settings) {
+        return std::nullopt;
+    }
+    if ((settings->record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) == 0) {
+        fail(ErrorNumber::invalid, "Neither FTP nor FTPS is enabled.");
+        return std::nullopt;
+    }
+    const auto found = checkFtpSettings(*settings) < 0 ? std::nullopt : surveyFtp(*settings);
+    if (!found || testRendering(*settings, found->places) < 0) {
+        return std::nullopt;
+    }
+    return writePlan(*settings, *found);
+}
+
+int refreshShareMap() {
+    const auto shares = allShares();
+    return shares ? replaceFile(ftpRunFolder() / "shares.map", shareMapText(*shares), 0644) : -1;
+}
+
+} // namespace velt

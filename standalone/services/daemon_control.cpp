@@ -1,0 +1,137 @@
+#include "standalone/services/daemon_control.h"
+
+#include "standalone/core/last_error.h"
+#include "standalone/core/unique_fd.h"
+#include "standalone/ports/port_probe.h"
+#include "standalone/services/service_backend.h"
+#include "standalone/settings/settings.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <string>
+#include <utility>
+
+namespace velt {
+namespace {
+
+constexpr std::array<std::pair<std::string_view, Daemon>, 4> services{{
+    {"ftpd", Daemon::ftp},
+    {"ftpd-pure", Daemon::ftp},
+    {"ftpd-ssl", Daemon::ftp},
+    {"sftp", Daemon::sftp},
+}};
+
+std::string nameOf(Daemon daemon) {
+    return daemon == Daemon::ftp ? "ftpd" : "sftp";
+}
+
+/// One operation on a daemon at a time, over all threads and processes. Not the lock of the settings: a start may take
+/// seconds, in which settings can be read and written.
+class OperationLock {
+public:
+    explicit OperationLock(Daemon daemon) {
+        const std::filesystem::path directory = runDirectory();
+        if (directory.empty()) {
+            return;
+        }
+        const std::filesystem::path file = directory / (nameOf(daemon) + ".operation");
+        descriptor_ = UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
+        int result = descriptor_ ? 0 : -1;
+        while (descriptor_ && (result = ::flock(descriptor_.get(), LOCK_EX)) != 0 && errno == EINTR) {
+        }
+        if (result != 0) {
+            fail(ErrorNumber::store,
+                 "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
+        }
+        held_ = result == 0;
+    }
+
+    explicit operator bool() const { return held_; }
+
+private:
+    UniqueFd descriptor_;
+    bool held_ = false;
+};
+
+bool ftpIsWanted(const FtpSettings& settings) {
+    return (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
+}
+
+/// The ports that the stored settings ask for; none when the settings do not want the daemon or cannot be read.
+std::vector<int> wantedPorts(Daemon daemon) {
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        if (settings && ftpIsWanted(*settings)) {
+            return {controlPort(settings->record)};
+        }
+    } else if (const auto settings = loadSftpSettings(); settings && settings->enabled) {
+        return {settings->port};
+    }
+    return {};
+}
+
+} // namespace
+
+std::optional<Daemon> daemonOf(const char* service) {
+    const std::string_view name = service == nullptr ? std::string_view() : service;
+    for (const auto& [known, daemon] : services) {
+        if (known == name) {
+            return daemon;
+        }
+    }
+    fail(ErrorNumber::notFound, "There is no service \"" + std::string(name) + "\".");
+    return std::nullopt;
+}
+
+int startDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    const auto backend = makeServiceBackend(nameOf(daemon));
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        if (!settings) {
+            return -1;
+        }
+        if (!ftpIsWanted(*settings)) {
+            return backend->stop();
+        }
+    }
+    const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
+    return plan ? backend->start(*plan) : -1;
+}
+
+int stopDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    return lock ? makeServiceBackend(nameOf(daemon))->stop() : -1;
+}
+
+int stopDaemonForRestart(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    const auto backend = makeServiceBackend(nameOf(daemon));
+    const ServiceState now = backend->state();
+    if (isServing(now) && probePorts(wantedPorts(daemon), now.daemon.pid) < 0) {
+        return -1;
+    }
+    return backend->stop();
+}
+
+int pauseDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    return lock ? makeServiceBackend(nameOf(daemon))->pause() : -1;
+}
+
+ServiceState daemonState(Daemon daemon) {
+    return makeServiceBackend(nameOf(daemon))->state();
+}
+
+} // namespace velt
