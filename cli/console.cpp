@@ -4,7 +4,6 @@
 
 #include <fstream>
 #include <istream>
-#include <iterator>
 
 namespace velt::cli {
 
@@ -15,11 +14,12 @@ std::string readInput(Console& console, const std::string& name) {
     }
     std::istream& source = name == "-" ? console.in : file;
     std::string text;
-    if (source) {
-        text.assign(std::istreambuf_iterator<char>(source), std::istreambuf_iterator<char>());
+    char buffer[4096];
+    while (source.read(buffer, sizeof buffer) || source.gcount() > 0) {
+        text.append(buffer, static_cast<std::size_t>(source.gcount()));
     }
-    // A folder opens like a file; only reading it fails. A read to the end leaves the end-of-file state alone.
-    if (source.bad() || (name != "-" && (!file.is_open() || file.fail()))) {
+    // A folder opens like a file; only reading it fails.
+    if (source.bad() || (name != "-" && !file.is_open())) {
         throw Failure(ExitCode::usage, "The file " + name + " cannot be read.",
                       "Name a readable file, or - for the standard input.");
     }

@@ -58,9 +58,9 @@ Setting utf8Setting(int version) {
     case 1:
         return {"enable_utf8", boolean, "UTF-8 is supported"};
     case 2:
-        return {"use_utf8", boolean, "UTF-8 is used for all clients"};
+        return {"use_utf8", boolean, "UTF-8 is used"};
     default:
-        return {"utf8_mode", integer, "0: no UTF-8, 1: for clients that ask for it, 2: for all clients"};
+        return {"utf8_mode", integer, "0: no UTF-8, 1: supported, 2: supported and used"};
     }
 }
 
@@ -108,9 +108,9 @@ SettingGroup ftpSettings(int version) {
              {"enable_ascii", boolean, "ASCII mode"},
              {"enable_fips", boolean, "only cryptography approved by FIPS"},
              {"enable_flow_ctrl", boolean, "the two bandwidth limits apply"},
-             {"maxuploadrate", integer, "upload limit in KB/s, 0: none"},
-             {"maxdownloadrate", integer, "download limit in KB/s, 0: none"},
-             {"max_conn_per_ip", integer, "connections per client address, 0: no limit"}}};
+             {"maxuploadrate", integer, "upload limit in KB/s"},
+             {"maxdownloadrate", integer, "download limit in KB/s"},
+             {"max_conn_per_ip", integer, "connections per client address"}}};
 }
 
 SettingGroup securitySettings() {
