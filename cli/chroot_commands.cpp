@@ -50,8 +50,8 @@ void replaceRules(Session& session, const RuleOptions& options) {
     std::string problem;
     const std::optional<Json::Value> document = parseJson(readInput(session.console, options.file), problem);
     if (!document) {
-        throw Failure(ExitCode::refused, options.file + " is not JSON.", "Correct it; nothing was changed.")
-            .note(problem);
+        throw Failure(ExitCode::refused, options.file + " is not JSON.", "Correct it; nothing was changed.",
+                      {problem});
     }
     std::vector<std::string> faults;
     const Json::Value& array = document->isObject() ? (*document)["rules"] : *document;

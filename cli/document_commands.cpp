@@ -38,8 +38,8 @@ Json::Value readDocument(Session& session, const std::string& name) {
     std::string problem;
     const std::optional<Json::Value> document = parseJson(readInput(session.console, name), problem);
     if (!document) {
-        throw Failure(ExitCode::refused, name + " is not JSON.", "Correct it; nothing was changed.")
-            .note(problem);
+        throw Failure(ExitCode::refused, name + " is not JSON.", "Correct it; nothing was changed.",
+                      {problem});
     }
     const std::vector<std::string> faults = documentFaults(*document);
     if (!faults.empty()) {

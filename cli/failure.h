@@ -14,14 +14,12 @@ namespace velt::cli {
 class Failure : public std::runtime_error {
 public:
     /// `message` is one sentence without a name in front; `hint` says what to do next and may be empty.
-    Failure(ExitCode code, const std::string& message, std::string hint = {})
-        : std::runtime_error(message), code_(code), hint_(std::move(hint)) {}
+    Failure(ExitCode code, const std::string& message, std::string hint = {},
+            std::vector<std::string> notes = {})
+        : std::runtime_error(message), code_(code), hint_(std::move(hint)), notes_(std::move(notes)) {}
 
     /// Adds a line of explanation below the message.
-    Failure& note(std::string line) {
-        notes_.push_back(std::move(line));
-        return *this;
-    }
+    void note(std::string line) { notes_.push_back(std::move(line)); }
 
     ExitCode code() const { return code_; }
     const std::string& hint() const { return hint_; }

@@ -18,9 +18,9 @@ enum class SettingType {
 };
 
 struct Setting {
-    const char* key;
-    SettingType type;
-    const char* meaning;
+    const char* key = nullptr;
+    SettingType type = SettingType::text;
+    const char* meaning = nullptr;
     bool required = false; ///< every change must name it, changed or not
 };
 

@@ -73,7 +73,7 @@ void dropIdlePassiveRange(Json::Value& wanted, const Json::Value& section, const
 }
 
 void dropEmptyAddress(Json::Value& wanted, const Json::Value& current, std::vector<std::string>& warnings) {
-    if (wanted.isMember("ext_ip") && wanted["ext_ip"] == "") {
+    if (wanted.isMember("ext_ip") && wanted["ext_ip"].asString().empty()) {
         warnings.push_back("ftp.ext_ip stays " + displayValue(current["ext_ip"]) +
                            ": the server takes no empty address; set use_ext_ip to off instead.");
         wanted.removeMember("ext_ip");

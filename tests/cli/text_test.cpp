@@ -47,7 +47,7 @@ TEST(TextTest, DurationsHaveTwoUnits) {
     EXPECT_EQ(durationText(8), "8 s");
     EXPECT_EQ(durationText(63), "1 min 3 s");
     EXPECT_EQ(durationText(3600 * 5 + 60 * 10 + 1), "5 h 10 min");
-    EXPECT_EQ(durationText(86400 * 3), "3 d 0 h");
+    EXPECT_EQ(durationText(259200), "3 d 0 h");
 }
 
 TEST(TextTest, ValuesAreShownForPeople) {
