@@ -62,6 +62,12 @@ void HandlerTest::TearDown() {
     }
 }
 
+void HandlerTest::startAfresh() {
+    SCOPED_TRACE("at the end of the round before");
+    TearDown();
+    SetUp();
+}
+
 Lines HandlerTest::run(VELT::APIEntryFunction entry, const std::string& params) {
     fake::Request request(json(params));
     fake::Response response;

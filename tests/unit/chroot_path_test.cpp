@@ -39,7 +39,8 @@ protected:
 
     fs::path folder() const { return root_ / "media"; }
 
-    /// Loads one rule with `path` and returns its "path_exist". Exactly the share `share` must have been looked up.
+    /// Loads one rule with `path` and returns its "path_exist". Exactly the share `share` must have been
+    /// looked up.
     bool exists(const std::string& path, const std::string& share) {
         const int sharesBefore = sharesFound_;
         sharesFound_ += platform.shares.contains(share) ? 1 : 0;

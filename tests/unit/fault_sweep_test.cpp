@@ -1,5 +1,5 @@
-// Each platform call of a full request is made to fail, and to throw, in turn. Whatever fails: one answer, nothing
-// called after the failure that decides it, no handle left.
+// Each platform call of a full request is made to fail, and to throw, in turn. Whatever fails: one answer,
+// nothing called after the failure that decides it, no handle left.
 
 #include "tests/support/full_requests.h"
 #include "tests/support/handler_test.h"
@@ -49,7 +49,7 @@ bool isOfThePlatform(const std::string& operation) {
 class FaultSweep : public HandlerTest, public testing::WithParamInterface<FullRequest> {
 protected:
     void prepare() {
-        platform.reset();
+        startAfresh();
         GetParam().prepare(platform);
     }
 
@@ -71,8 +71,8 @@ protected:
 
     bool isTolerated(const std::string& operation) const {
         const std::string name = GetParam().name;
-        // A rule's share that cannot be found means that its directory does not exist; the reading of settings needs the
-        // FIPS switch, the applying takes a failure as on.
+        // A rule's share that cannot be found means that its directory does not exist; the reading of
+        // settings needs the FIPS switch, the applying takes a failure as on.
         return tolerated.contains(operation) ||
                (operation == "VELTShareGet" && name == "FTPChrootUserLoad") ||
                (operation == "VELTFTPFIPSEnabledGet" && name.starts_with("FTPSet"));
