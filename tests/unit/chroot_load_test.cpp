@@ -92,6 +92,16 @@ TEST_F(ChrootLoadTest, AnswersWithNoRulesWhenNoLineCanBeParsed) {
               (Lines{alloc, enumerate, parse("x"), parse("y"), freeList, succeeded(noRules)}));
 }
 
+TEST_F(ChrootLoadTest, TakesAnyFlagButZeroForAUsersRule) {
+    platform.rules = {"user:1001:/home", "group:2001:/home"};
+    for (const int flag : {-1, 2, 256}) {
+        platform.userFlag = flag;
+        EXPECT_EQ(run(FTPChrootUserLoad).back(),
+                  answered(homeRule("user", "alice") + "," + homeRule("group", "staff"), 2))
+            << flag;
+    }
+}
+
 TEST_F(ChrootLoadTest, KeepsWhatAParserLeavesAloneFromTheLineBefore) {
     platform.rules = {"user:1001:/home", "second", "group:2001:/home", "fourth"};
     for (const int nth : {2, 4}) {
@@ -148,6 +158,15 @@ TEST_F(ChrootLoadTest, FailsWithoutAList) {
         (Lines{alloc, failureOf("Failed to malloc for list.")} + failed("chroot", 1902, R"({"unread":1})")));
     const std::string& text = platform.logLines.front().rendered;
     EXPECT_EQ(text.substr(text.find(' ')), " Failed to malloc for list.[0x002A rule.c:7]");
+}
+
+TEST_F(ChrootLoadTest, AsksForTheLastErrorOnceInTheOrderOfTheFailuresLogLine) {
+    platform.journalErrorGets = true;
+    platform.fail("VELTFTPChrootRuleEnum");
+    EXPECT_EQ(run(FTPChrootUserLoad),
+              (Lines{alloc, enumerate, "VLIBCErrGet()", "VLIBCErrorGetFile()", "VLIBCErrorGetLine()",
+                     failureOf("Failed to VELTFTPChrootRuleEnum()."), freeList} +
+               failed("chroot", 1902, "{}")));
 }
 
 TEST_F(ChrootLoadTest, FreesTheListWhenTheRulesCannotBeListed) {

@@ -156,6 +156,15 @@ TEST_F(ChrootSaveTest, DropsTheRuleOfAnUnknownGroupWithALogLine) {
                savedAs({"group:2001:/b"})));
 }
 
+TEST_F(ChrootSaveTest, AsksForTheLastErrorOnceInTheOrderOfTheLogLine) {
+    platform.journalErrorGets = true;
+    EXPECT_EQ(saveRules("[" + rule("user", "ghost", "/a") + "]"),
+              (begun() +
+               Lines{getUser("ghost"), "VLIBCErrGet()", "VLIBCErrorGetFile()", "VLIBCErrorGetLine()",
+                     unknown("VELTUserGet", "ghost")} +
+               savedAs({})));
+}
+
 TEST_F(ChrootSaveTest, DropsARuleThatCannotBeFormattedWithoutAMessage) {
     platform.fail("VELTFTPChrootRuleFormat", 1);
     EXPECT_EQ(saveRules("[" + rule("user", "alice", "/a") + "," + rule("user", "bob", "/b") + "]"),

@@ -220,6 +220,9 @@ TEST_F(FakePlatform, ReadsTheRulesItWrites) {
     EXPECT_EQ(isUser, 1);
     EXPECT_STREQ(name, "bob");
     EXPECT_STREQ(path, "/photos/a:b");
+    platform.userFlag = -1;
+    ASSERT_EQ(VELTFTPChrootRuleParseToName(line, &isUser, name, sizeof(name), path, sizeof(path)), 0);
+    EXPECT_EQ(isUser, -1);
     for (const char* bad : {"", "user:1000", "user:7:/x", "group:1000:/x", "user:bob:/x"}) {
         EXPECT_LT(VELTFTPChrootRuleParseToName(bad, &isUser, name, sizeof(name), path, sizeof(path)), 0)
             << bad;
