@@ -69,7 +69,11 @@ void HandlerTest::startAfresh() {
 }
 
 Lines HandlerTest::run(VELT::APIEntryFunction entry, const std::string& params) {
-    fake::Request request(json(params));
+    return runWith(entry, json(params));
+}
+
+Lines HandlerTest::runWith(VELT::APIEntryFunction entry, const Json::Value& params) {
+    fake::Request request(params);
     fake::Response response;
     platform.journal.clear();
     entry(&request, &response);

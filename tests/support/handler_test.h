@@ -47,6 +47,9 @@ protected:
     /// Runs one request and returns the journal of it alone. The answer is checked to be exactly one.
     Lines run(VELT::APIEntryFunction entry, const std::string& params = "{}");
 
+    /// The same with parameters that JSON text cannot express, such as a number's type.
+    Lines runWith(VELT::APIEntryFunction entry, const Json::Value& params);
+
     /// Runs one request whose entry function lets an exception pass, returns the journal, and checks that
     /// there was no answer.
     template<typename Exception>

@@ -182,6 +182,12 @@ TEST_F(ChrootUserListTest, TakesAnEmptySubstringForNoneButHandsAnEmptyDomainOn) 
                      succeeded(R"({"total":0,"user":[]})")}));
 }
 
+TEST_F(ChrootUserListTest, HandsASubstringThatBeginsWithNulOnAsAnEmptyTextAndNotAsNone) {
+    EXPECT_EQ(run(FTPChrootUserList, R"({"chroot":true,"substr":"\u0000al"})"),
+              (Lines{getParams(), alloc, enumerated(true, R"(1, "", null)"), freeList,
+                     succeeded(R"({"total":0,"user":[]})")}));
+}
+
 TEST_F(ChrootUserListTest, ListsEverythingWithoutOffsetAndLimit) {
     listFive();
     EXPECT_EQ(page(R"({"chroot":true})"), "01234");
