@@ -57,7 +57,8 @@ protected:
     }
 };
 
-// A set of rules that is an object cannot be indexed by number; what is no text reads as text where it can.
+// A set of rules that is an object with members cannot be indexed by number, and an array whose elements are
+// no objects has no keys.
 bool mayThrow(const std::string& key, const Json::Value& value) {
     return key == "rules" && ((value.isObject() && !value.empty()) || (value.isArray() && !value.empty()));
 }
