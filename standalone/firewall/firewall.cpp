@@ -64,7 +64,17 @@ void warnOfForeignTables() {
     }
 }
 
+/// The rules belong to the machine, so an installation below another root leaves them alone unless it was told about a
+/// firewall: its defaults would take away what the machine's own installation drops.
+bool mayTouchRules() {
+    std::error_code ignored;
+    return statePath("/") == "/" || std::filesystem::exists(statePath("/etc/velt/firewall.conf"), ignored);
+}
+
 int loadRules() {
+    if (!mayTouchRules()) {
+        return 0;
+    }
     const auto firewall = loadFirewallSettings();
     if (!firewall) {
         return -1;

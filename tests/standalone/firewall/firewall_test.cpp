@@ -60,6 +60,7 @@ protected:
             GTEST_SKIP() << "no private network here";
         }
         storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
+        setMode(""); // below this root no rule is touched without a file
     }
 
     void TearDown() override { std::filesystem::remove_all(root_); }
@@ -167,6 +168,18 @@ TEST_F(FirewallTest, AnotherFirewallThatDropsIsPointedOut) {
     ASSERT_EQ(runProcess({"nft", "delete", "table", "ip", "other"}).exitCode, 0);
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
     EXPECT_EQ(warning(), "");
+}
+
+TEST_F(FirewallTest, AnInstallationElsewhereWithoutAFileLeavesTheRulesAlone) {
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::string before = listTable();
+    setStateRoot(root_ / "second");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(listTable(), before);
+    setMode("mode = accept");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), before);
 }
 
 TEST_F(FirewallTest, OtherTablesStay) {
