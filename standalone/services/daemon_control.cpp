@@ -1,5 +1,6 @@
 #include "standalone/services/daemon_control.h"
 
+#include "platform/firewall.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/unique_fd.h"
 #include "standalone/ports/port_probe.h"
@@ -9,6 +10,7 @@
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
+#include <syslog.h>
 
 #include <array>
 #include <cerrno>
@@ -75,6 +77,15 @@ std::vector<int> wantedPorts(Daemon daemon) {
     return {};
 }
 
+/// After a start or a stop with this result: the rules open the ports of what is enabled, which may have changed although no
+/// port did. A daemon that did what was asked of it has not failed because of them.
+int followedByFirewall(int result) {
+    if (result >= 0 && VELTFwRuleHup() < 0) {
+        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    }
+    return result;
+}
+
 } // namespace
 
 std::optional<Daemon> daemonOf(const char* service) {
@@ -100,16 +111,16 @@ int startDaemon(Daemon daemon) {
             return -1;
         }
         if (!ftpIsWanted(*settings)) {
-            return backend->stop();
+            return followedByFirewall(backend->stop());
         }
     }
     const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
-    return plan ? backend->start(*plan) : -1;
+    return plan ? followedByFirewall(backend->start(*plan)) : -1;
 }
 
 int stopDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
-    return lock ? makeServiceBackend(nameOf(daemon))->stop() : -1;
+    return lock ? followedByFirewall(makeServiceBackend(nameOf(daemon))->stop()) : -1;
 }
 
 int stopDaemonForRestart(Daemon daemon) {
@@ -119,10 +130,13 @@ int stopDaemonForRestart(Daemon daemon) {
     }
     const auto backend = makeServiceBackend(nameOf(daemon));
     const ServiceState now = backend->state();
-    if (isServing(now) && probePorts(wantedPorts(daemon), now.daemon.pid) < 0) {
+    const std::vector<int> ports = wantedPorts(daemon);
+    if (isServing(now) && probePorts(ports, now.daemon.pid) < 0) {
         return -1;
     }
-    return backend->stop();
+    // What is still wanted is started next, and the firewall follows that.
+    const int result = backend->stop();
+    return ports.empty() ? followedByFirewall(result) : result;
 }
 
 int pauseDaemon(Daemon daemon) {

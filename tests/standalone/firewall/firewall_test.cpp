@@ -2,6 +2,7 @@
 
 #include "ftp/ftp_library.h"
 #include "platform/firewall.h"
+#include "platform/service.h"
 #include "platform/sftp.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
@@ -9,6 +10,8 @@
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/firewall/private_network.h"
+#include "tests/standalone/services/plan_double.h"
+#include "tests/standalone/supervise/daemon_test.h"
 
 #include <gtest/gtest.h>
 
@@ -48,13 +51,10 @@ std::string listTable() {
     return runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).output;
 }
 
-class FirewallTest : public testing::Test {
+class FirewallTest : public DaemonTest {
 protected:
     void SetUp() override {
-        std::string folder = testing::TempDir() + "velt-firewall-XXXXXX";
-        ASSERT_NE(::mkdtemp(folder.data()), nullptr);
-        root_ = folder;
-        setStateRoot(root_);
+        DaemonTest::SetUp();
         network_.emplace();
         if (!network_->isThere() || runProcess({"nft", "list", "tables"}).exitCode != 0) {
             GTEST_SKIP() << "no private network here";
@@ -63,7 +63,10 @@ protected:
         setMode(""); // below this root no rule is touched without a file
     }
 
-    void TearDown() override { std::filesystem::remove_all(root_); }
+    void TearDown() override {
+        network_.reset(); // its other host is a process of ours
+        DaemonTest::TearDown();
+    }
 
     static void storeFtp(int port, int flags, int passiveFirst = 0, int passiveLast = 0) {
         _tag_VELT_FTP_CONF_ record{};
@@ -81,7 +84,6 @@ protected:
 
     static std::string warning() { return readFile(statePath("/run/velt/firewall.warning")).value_or(""); }
 
-    std::filesystem::path root_;
     std::optional<PrivateNetwork> network_;
 };
 
@@ -127,6 +129,36 @@ TEST_F(FirewallTest, TheRulesFollowThePorts) {
     storeFtp(2122, 0);
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
     EXPECT_FALSE(network_->neighbourReaches(2122));
+}
+
+TEST_F(FirewallTest, TheRulesFollowWhatIsEnabled) {
+    planDouble() = {};
+    planDouble().ftpOptions = planDouble().sftpOptions = {"--any"};
+    storeFtp(2121, 0);
+    ASSERT_EQ(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+    ASSERT_EQ(VELTSFTPConfigSet(1, 2222), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2222));
+    storeFtp(2121, 0);
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    ASSERT_EQ(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+    const OpenPort formerFtp(2121);
+    const OpenPort formerSftp(2222);
+    EXPECT_FALSE(network_->neighbourReaches(2121));
+    EXPECT_FALSE(network_->neighbourReaches(2222));
+}
+
+TEST_F(FirewallTest, RulesThatCannotBeLoadedKeepNoServiceDown) {
+    planDouble() = {};
+    setMode("mode = open");
+    EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
 }
 
 TEST_F(FirewallTest, OverlappingPortsAreOneSet) {
