@@ -115,7 +115,11 @@ int startDaemon(Daemon daemon) {
         }
     }
     const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
-    return plan ? followedByFirewall(backend->start(*plan)) : -1;
+    if (!plan || backend->start(*plan) < 0) {
+        return -1;
+    }
+    removeFormerPlans(*plan);
+    return followedByFirewall(0);
 }
 
 int stopDaemon(Daemon daemon) {
