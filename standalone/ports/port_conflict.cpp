@@ -142,8 +142,13 @@ std::vector<ProcessId> ownProcesses(const Question& question) {
 
 std::optional<Conflict> conflictWithListener(const Question& question, const ConfiguredPorts& ports) {
     std::vector<ListeningSocket> sockets = listeningSockets();
+    // A stored passive range may have a port less, since each session takes one that is free. A daemon's own port must be free,
+    // also when it is the stored one: the service may have been off.
+    const auto canDoWithout = [&](int port) {
+        return !question.isOnePort() && isOwnPort(question, ports, port);
+    };
     std::erase_if(sockets, [&](const ListeningSocket& socket) {
-        return !question.holds(socket.port) || isOwnPort(question, ports, socket.port);
+        return !question.holds(socket.port) || canDoWithout(socket.port);
     });
     if (sockets.empty()) {
         return std::nullopt;

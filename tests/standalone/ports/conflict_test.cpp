@@ -162,6 +162,16 @@ TEST_F(PortConflictTest, WhoeverListensIsNamed) {
     expectConflict("ftp", port - 1, port + 1, port, thisProcess());
 }
 
+TEST_F(PortConflictTest, AStrangerOnTheStoredPortConflicts) {
+    const Listener onFtp(ftpPort_);
+    const Listener onSftp(sftpPort_);
+    expectConflict("ftp", ftpPort_, ftpPort_, ftpPort_, thisProcess());
+    expectConflict("ssh", sftpPort_, sftpPort_, sftpPort_, thisProcess());
+    const Listener onPassive(45003);
+    storeFtp(45000, 45010);
+    expectNoConflict("ftp", 45000, 45010);
+}
+
 TEST_F(PortConflictTest, TheDaemonAndItsSessionsAreNotInTheirOwnWay) {
     storeFtp(0, 0, VELT_FTP_SERVICE_PLAIN);
     const int second = freePort();
@@ -169,6 +179,7 @@ TEST_F(PortConflictTest, TheDaemonAndItsSessionsAreNotInTheirOwnWay) {
     ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     ASSERT_TRUE(waitUntil([&] { return accepts(second); }, std::chrono::seconds(1)));
     expectNoConflict("ftp", second, second);
+    expectNoConflict("ftp", ftpPort_, ftpPort_);
     expectConflict("ssh", second, second, second,
                    "velt-test-daemo (process " + std::to_string(serviceState("ftpd").daemon.pid) + ")");
 }
