@@ -10,6 +10,7 @@
 #include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/ruleset.h"
 #include "standalone/settings/settings.h"
+#include "standalone/supervise/process_identity.h"
 
 #include <syslog.h>
 
@@ -20,9 +21,14 @@
 namespace velt {
 namespace {
 
-/// Stands while rules of ours are loaded; like these it is gone after a boot.
+/// Stands while rules of ours are loaded, with the boot of the machine in which they were: below a state root other than "/"
+/// the file outlives a boot, the rules do not.
 std::filesystem::path loadedMark() {
     return statePath("/run/velt/firewall.loaded");
+}
+
+bool rulesAreLoaded() {
+    return readFile(loadedMark()) == bootId();
 }
 
 /// For the administrator: why ports may be closed although we opened them.
@@ -80,7 +86,7 @@ int loadRules() {
         return -1;
     }
     std::error_code ignored;
-    if (firewall->mode == FirewallMode::off && !std::filesystem::exists(loadedMark(), ignored)) {
+    if (firewall->mode == FirewallMode::off && !rulesAreLoaded()) {
         return 0; // nothing to take away, and perhaps no right to do it
     }
     const auto ftp = loadFtpSettings();
@@ -89,7 +95,7 @@ int loadRules() {
         return -1;
     }
     // Before the rules, since a mark without rules does no harm.
-    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), "", 0644) < 0) {
+    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), bootId(), 0644) < 0) {
         return -1;
     }
     const ProcessResult result =

@@ -232,6 +232,14 @@ TEST_F(FirewallTest, AListedEffectChangesNothing) {
     EXPECT_EQ(listTable(), "");
 }
 
+TEST_F(FirewallTest, AMarkFromBeforeABootIsNoSignOfRules) {
+    ASSERT_EQ(replaceFile(statePath("/run/velt/firewall.loaded"), "another boot", 0644), 0);
+    ASSERT_EQ(runProcess({"nft", "add", "table", "inet", "velt_fileserv"}).exitCode, 0);
+    setMode("mode = off");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), "") << "the table is somebody else's";
+}
+
 /// Runs in a child without the right to administer the network: its exit status is what `test` returns.
 template<class Test> int withoutRights(const Test& test) {
     const pid_t child = ::fork();
