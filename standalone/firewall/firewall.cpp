@@ -81,7 +81,9 @@ int loadRules() {
     if (!mayTouchRules()) {
         return 0;
     }
-    const auto firewall = loadFirewallSettings();
+    // Held until the rules are loaded: of two processes the one with the older settings must not load its rules last.
+    const StateLock lock;
+    const auto firewall = lock ? loadFirewallSettings() : std::nullopt;
     if (!firewall) {
         return -1;
     }

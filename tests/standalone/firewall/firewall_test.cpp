@@ -22,9 +22,13 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <atomic>
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <optional>
+#include <thread>
+#include <utility>
 
 namespace velt::test {
 namespace {
@@ -161,6 +165,21 @@ TEST_F(FirewallTest, RulesThatCannotBeLoadedKeepNoServiceDown) {
     EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
 }
 
+TEST_F(FirewallTest, SettingsInTheMiddleOfAChangeAreWaitedFor) {
+    std::optional<StateLock> change(std::in_place);
+    std::atomic<bool> done = false;
+    std::thread loader([&done] {
+        EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+        done = true;
+    });
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    EXPECT_FALSE(done);
+    storeFtp(2122, VELT_FTP_SERVICE_PLAIN);
+    change.reset();
+    loader.join();
+    EXPECT_NE(listTable().find("2122"), std::string::npos) << listTable();
+}
+
 TEST_F(FirewallTest, OverlappingPortsAreOneSet) {
     setMode("mode = drop\nports = 2121 2100-2130 22");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
@@ -255,7 +274,9 @@ template<class Test> int withoutRights(const Test& test) {
 TEST_F(FirewallTest, WithoutTheRightsTheErrorSaysSo) {
     std::filesystem::permissions(root_, std::filesystem::perms::all);
     std::filesystem::create_directories(statePath("/run/velt"));
-    std::filesystem::permissions(statePath("/run/velt"), std::filesystem::perms::all);
+    for (const char* place : {"/run/velt", "/var/lib/velt/lock"}) {
+        std::filesystem::permissions(statePath(place), std::filesystem::perms::all);
+    }
     EXPECT_EQ(withoutRights([] {
                   const bool refused = VELTFwRuleHup() < 0;
                   return refused && lastErrorSentence() ==
