@@ -5,6 +5,7 @@
 #include "standalone/core/process.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/services/systemd_unit.h"
+#include "standalone/supervise/last_words.h"
 
 #include <algorithm>
 #include <charconv>
@@ -21,12 +22,9 @@ constexpr milliseconds startLimit{4700};
 constexpr milliseconds pollInterval{20};
 constexpr milliseconds patience{2000};
 
-std::string oneLine(std::string text) {
+std::string withoutLineEnd(std::string text) {
     while (!text.empty() && text.back() == '\n') {
         text.pop_back();
-    }
-    for (auto end = text.find('\n'); end != std::string::npos; end = text.find('\n', end)) {
-        text.replace(end, 1, " | ");
     }
     return text;
 }
@@ -37,7 +35,7 @@ SystemdBackend::SystemdBackend(std::string daemon, SystemdPlaces places)
     : daemon_(std::move(daemon)), places_(std::move(places)) {}
 
 std::string SystemdBackend::property(const std::string& name) const {
-    return oneLine(
+    return withoutLineEnd(
         runProcess({places_.systemctl, "show", "--value", "--property=" + name, unitName(daemon_)}).output);
 }
 
@@ -59,7 +57,7 @@ ServiceState SystemdBackend::state() const {
         state.state = RunState::running;
     } else if (active == "failed" || active == "activating") {
         state.state = RunState::failed;
-        state.reason = lastLines();
+        state.reason = reasonInJournal();
     }
     return state;
 }
@@ -75,7 +73,7 @@ int SystemdBackend::start(const DaemonPlan& plan) {
     const ProcessResult started =
         runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
     if (started.exitCode != 0) {
-        return failedToStart(daemon_, oneLine(started.errors));
+        return failedToStart(daemon_, lastWords(started.errors));
     }
     return waitUntilServing();
 }
@@ -86,7 +84,7 @@ int SystemdBackend::writeUnit(const DaemonPlan& plan) const {
         return -1;
     }
     const ProcessResult reloaded = runProcess({places_.systemctl, "daemon-reload"});
-    return reloaded.exitCode == 0 ? 0 : failedToStart(daemon_, oneLine(reloaded.errors));
+    return reloaded.exitCode == 0 ? 0 : failedToStart(daemon_, lastWords(reloaded.errors));
 }
 
 int SystemdBackend::waitUntilServing() const {
@@ -98,7 +96,7 @@ int SystemdBackend::waitUntilServing() const {
         }
         const bool late = std::chrono::steady_clock::now() >= deadline;
         if (now.state == RunState::failed || late) {
-            const std::string words = lastLines();
+            const std::string words = reasonInJournal();
             runProcess({places_.systemctl, "stop", unitName(daemon_)});
             return failedToStart(daemon_, late && words.empty() ? "it does not listen in time" : words);
         }
@@ -106,10 +104,10 @@ int SystemdBackend::waitUntilServing() const {
     }
 }
 
-std::string SystemdBackend::lastLines() const {
-    return oneLine(runProcess({places_.journalctl, "--unit=" + unitName(daemon_), "--lines=5", "--output=cat",
-                               "--no-pager"})
-                       .output);
+std::string SystemdBackend::reasonInJournal() const {
+    return lastWords(runProcess({places_.journalctl, "--unit=" + unitName(daemon_), "--lines=5",
+                                 "--output=cat", "--no-pager"})
+                         .output);
 }
 
 int SystemdBackend::endListener() const {
@@ -120,7 +118,7 @@ int SystemdBackend::endListener() const {
     const ProcessResult stopped = runProcess({places_.systemctl, "stop", unitName(daemon_)});
     if (stopped.exitCode != 0) {
         return fail(ErrorNumber::daemon,
-                    daemonTitle(daemon_) + " cannot be stopped: " + oneLine(stopped.errors) + ".");
+                    daemonTitle(daemon_) + " cannot be stopped: " + lastWords(stopped.errors) + ".");
     }
     return 0;
 }

@@ -34,7 +34,7 @@ private:
     int endListener() const;
     std::string property(const std::string& name) const;
     std::vector<ProcessId> unitProcesses(const std::string& controlGroup) const;
-    std::string lastLines() const;
+    std::string reasonInJournal() const;
 
     std::string daemon_;
     SystemdPlaces places_;
