@@ -63,6 +63,7 @@ ServiceState SystemdBackend::state() const {
 }
 
 int SystemdBackend::start(const DaemonPlan& plan) {
+    const auto deadline = Clock::now() + startLimit;
     const ServiceState now = state();
     if (isServing(now) && now.configurationHash == plan.configurationHash) {
         return 0;
@@ -71,11 +72,12 @@ int SystemdBackend::start(const DaemonPlan& plan) {
         return -1;
     }
     const ProcessResult started =
-        runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
+        runProcess({places_.systemctl, "restart", unitName(daemon_)}, {},
+                   std::chrono::duration_cast<milliseconds>(deadline - Clock::now()));
     if (started.exitCode != 0) {
         return failedToStart(daemon_, lastWords(started.errors));
     }
-    return waitUntilServing();
+    return waitUntilServing(deadline);
 }
 
 int SystemdBackend::writeUnit(const DaemonPlan& plan) const {
@@ -87,14 +89,13 @@ int SystemdBackend::writeUnit(const DaemonPlan& plan) const {
     return reloaded.exitCode == 0 ? 0 : failedToStart(daemon_, lastWords(reloaded.errors));
 }
 
-int SystemdBackend::waitUntilServing() const {
-    const auto deadline = std::chrono::steady_clock::now() + startLimit;
+int SystemdBackend::waitUntilServing(Clock::time_point deadline) const {
     for (;;) {
         const ServiceState now = state();
         if (isServing(now)) {
             return 0;
         }
-        const bool late = std::chrono::steady_clock::now() >= deadline;
+        const bool late = Clock::now() >= deadline;
         if (now.state == RunState::failed || late) {
             const std::string words = reasonInJournal();
             runProcess({places_.systemctl, "stop", unitName(daemon_)});
