@@ -5,6 +5,7 @@
 #include "standalone/core/unique_fd.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/services/service_backend.h"
+#include "standalone/settings/candidate.h"
 #include "standalone/settings/settings.h"
 
 #include <fcntl.h>
@@ -64,17 +65,29 @@ bool ftpIsWanted(const FtpSettings& settings) {
     return (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
 }
 
-/// The ports that the stored settings ask for; none when the settings do not want the daemon or cannot be read.
-std::vector<int> wantedPorts(Daemon daemon) {
+/// What a stop for a restart needs to know of the stored settings.
+struct NextStart {
+    bool wanted = false;  ///< false also when the settings cannot be read
+    bool possible = true; ///< else the last error says why not
+};
+
+/// The configuration's test takes the daemon's time, so nothing is tested where nothing runs.
+NextStart nextStart(Daemon daemon, const ServiceState& now) {
+    const bool serving = isServing(now);
+    const auto portIsFree = [&now](int port) { return probePorts({port}, now.daemon.pid) >= 0; };
     if (daemon == Daemon::ftp) {
         const auto settings = loadFtpSettings();
-        if (settings && ftpIsWanted(*settings)) {
-            return {controlPort(settings->record)};
+        if (!settings || !ftpIsWanted(*settings)) {
+            return {};
         }
-    } else if (const auto settings = loadSftpSettings(); settings && settings->enabled) {
-        return {settings->port};
+        return {true,
+                !serving || (portIsFree(controlPort(settings->record)) && testFtpCandidate(*settings) >= 0)};
     }
-    return {};
+    const auto settings = loadSftpSettings();
+    if (!settings || !settings->enabled) {
+        return {};
+    }
+    return {true, !serving || (portIsFree(settings->port) && testSftpCandidate(*settings) >= 0)};
 }
 
 /// After a start or a stop with this result: the rules open the ports of what is enabled, which may have changed although no
@@ -133,14 +146,13 @@ int stopDaemonForRestart(Daemon daemon) {
         return -1;
     }
     const auto backend = makeServiceBackend(nameOf(daemon));
-    const ServiceState now = backend->state();
-    const std::vector<int> ports = wantedPorts(daemon);
-    if (isServing(now) && probePorts(ports, now.daemon.pid) < 0) {
+    const NextStart next = nextStart(daemon, backend->state());
+    if (!next.possible) {
         return -1;
     }
     // What is still wanted is started next, and the firewall follows that.
     const int result = backend->stop();
-    return ports.empty() ? followedByFirewall(result) : result;
+    return next.wanted ? result : followedByFirewall(result);
 }
 
 int pauseDaemon(Daemon daemon) {

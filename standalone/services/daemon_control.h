@@ -26,7 +26,7 @@ int startDaemon(Daemon daemon);
 int stopDaemon(Daemon daemon);
 
 /// The same as the first half of a restart: refused, so that the former daemon serves on, when the ports of the stored settings are
-/// held by another program.
+/// held by another program, or when the daemon's own test refuses their configuration.
 int stopDaemonForRestart(Daemon daemon);
 
 /// Ends the listener only.

@@ -211,6 +211,10 @@ TEST_F(ServicesTest, ARefusedConfigurationLeavesTheDaemonAlone) {
     EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
     EXPECT_EQ(lastErrorSentence(), "The configuration was refused.");
     EXPECT_EQ(daemonOf("ftpd"), daemon);
+    clearLastError();
+    EXPECT_LT(VLIBServicectlStop("ftpd", 0), 0) << "the first half of a restart";
+    EXPECT_EQ(lastErrorSentence(), "The configuration was refused.");
+    EXPECT_TRUE(accepts(ftpPort_));
 }
 
 TEST_F(ServicesTest, DamagedSettingsStartNothing) {
