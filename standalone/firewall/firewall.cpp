@@ -41,7 +41,10 @@ std::string firstLine(const std::string& text) {
 }
 
 int failToLoad(const ProcessResult& result) {
-    const std::string reason = firstLine(result.errors);
+    std::string reason = firstLine(result.errors);
+    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
+        reason.pop_back(); // it may be a sentence of its own
+    }
     if (reason.find("Operation not permitted") != std::string::npos) {
         return fail(ErrorNumber::firewall,
                     "The firewall rules are not loaded: this process may not administer the network.");
