@@ -170,6 +170,8 @@ void DaemonProcess::readOutput() {
                 takeLine(std::exchange(partialLine_, {}));
             } else if (partialLine_.size() < longestLine) {
                 partialLine_ += character;
+            } else if (partialLine_.size() == longestLine) {
+                partialLine_ += "…"; // so that nobody takes it for the whole; a full stop would be taken off
             }
         }
     }

@@ -68,6 +68,13 @@ TEST_F(SupervisorTest, ADaemonThatRefusesToStartSaysWhy) {
     EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, seconds(1)));
 }
 
+TEST_F(SupervisorTest, ALineThatWasCutShowsIt) {
+    EXPECT_LT(backend_.start(testPlan(port_, "one", {"--refuse", "why: " + std::string(1000, 'x') + " end"})),
+              0);
+    EXPECT_NE(backend_.state().reason.find("xxx…"), std::string::npos) << backend_.state().reason;
+    EXPECT_EQ(backend_.state().reason.find("end"), std::string::npos) << backend_.state().reason;
+}
+
 TEST_F(SupervisorTest, ADaemonThatNeverListensFailsWithinFiveSeconds) {
     const auto began = Clock::now();
     EXPECT_LT(backend_.start(testPlan(port_, "one", {"--delay", "60000"})), 0);
