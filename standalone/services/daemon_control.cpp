@@ -1,6 +1,7 @@
 #include "standalone/services/daemon_control.h"
 
 #include "platform/firewall.h"
+#include "standalone/core/file_lock.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/unique_fd.h"
 #include "standalone/ports/port_probe.h"
@@ -9,7 +10,6 @@
 #include "standalone/settings/settings.h"
 
 #include <fcntl.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 #include <syslog.h>
 
@@ -44,14 +44,12 @@ public:
         }
         const std::filesystem::path file = directory / (nameOf(daemon) + ".operation");
         descriptor_ = UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
-        int result = descriptor_ ? 0 : -1;
-        while (descriptor_ && (result = ::flock(descriptor_.get(), LOCK_EX)) != 0 && errno == EINTR) {
-        }
-        if (result != 0) {
+        if (!descriptor_) {
             fail(ErrorNumber::store,
                  "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
+            return;
         }
-        held_ = result == 0;
+        held_ = waitForFileLock(descriptor_.get(), file) >= 0;
     }
 
     explicit operator bool() const { return held_; }
