@@ -1,5 +1,3 @@
-#include "standalone/ports/port_conflict.h"
-
 #include "platform/webapi.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
@@ -193,10 +191,6 @@ int findConflict(const Question& question) {
 }
 
 } // namespace
-
-const std::string& lastPortHolder() {
-    return lastConflict.holder;
-}
 
 PortConflict lastPortConflict() {
     return lastConflict;
