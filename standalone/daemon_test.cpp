@@ -3,11 +3,11 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
+#include "standalone/supervise/last_words.h"
 
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
-#include <sstream>
 
 namespace velt {
 
@@ -29,29 +29,6 @@ ScratchFolder::~ScratchFolder() {
         std::error_code error;
         std::filesystem::remove_all(path_, error);
     }
-}
-
-std::string lastWords(const std::string& errors) {
-    std::string words;
-    std::istringstream lines(errors);
-    for (std::string line; std::getline(lines, line);) {
-        // ProFTPD: "2026-01-31 12:00:00,123 host proftpd[42] host: fatal: ..."; what explains is the first such line.
-        if (const auto at = line.find(": fatal: "); at != std::string::npos) {
-            return line.substr(at + std::strlen(": fatal: "));
-        }
-        if (line.find_first_not_of(" \r\t") != std::string::npos) {
-            words = line;
-        }
-    }
-    if (const auto process = words.find(" proftpd["); process != std::string::npos) {
-        if (const auto colon = words.find(": ", process); colon != std::string::npos) {
-            words.erase(0, colon + 2);
-        }
-    }
-    while (!words.empty() && (words.back() == '\r' || words.back() == ' ' || words.back() == '.')) {
-        words.pop_back();
-    }
-    return words;
 }
 
 int runDaemonTest(const std::string& daemon, const std::vector<std::string>& arguments) {

@@ -24,9 +24,6 @@ private:
     std::filesystem::path path_;
 };
 
-/// What a daemon said last on its standard error, without time, process and host; "" when it said nothing.
-std::string lastWords(const std::string& errors);
-
 /// Runs the test; negative when the daemon refuses, with its own words in the last error. `daemon` is its name for people.
 int runDaemonTest(const std::string& daemon, const std::vector<std::string>& arguments);
 

@@ -1,27 +1,18 @@
+#include "standalone/core/file_lock.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/unique_fd.h"
 
 #include <fcntl.h>
-#include <sys/file.h>
 
-#include <algorithm>
 #include <cerrno>
-#include <chrono>
 #include <cstring>
 #include <system_error>
-#include <thread>
 
 namespace velt {
 
 namespace {
-
-using namespace std::chrono_literals;
-
-// Longer than any holder works, a daemon's start among them; past it somebody hangs, and saying so is better
-// than hanging as well.
-constexpr auto longestWait = 60s;
 
 // flock belongs to the opened file: each thread opens its own, so that threads of one process exclude each
 // other as processes do.
@@ -40,22 +31,6 @@ int failToLock(const std::filesystem::path& path, const std::string& why,
     return fail(ErrorNumber::store, "Cannot lock " + path.string() + ": " + why + ".", where);
 }
 
-int waitForLock(int fd, const std::filesystem::path& path) {
-    const auto deadline = std::chrono::steady_clock::now() + longestWait;
-    auto pause = std::chrono::microseconds(100);
-    while (::flock(fd, LOCK_EX | LOCK_NB) != 0) {
-        if (errno == EINTR)
-            continue;
-        if (errno != EWOULDBLOCK)
-            return failToLock(path, std::strerror(errno));
-        if (std::chrono::steady_clock::now() > deadline)
-            return failToLock(path, "another process has held it for a minute");
-        std::this_thread::sleep_for(pause);
-        pause = std::min(pause * 2, std::chrono::microseconds(5000));
-    }
-    return 0;
-}
-
 int openAndLock(UniqueFd& file) {
     const auto path = statePath("/var/lib/velt/lock");
     std::error_code error;
@@ -65,7 +40,7 @@ int openAndLock(UniqueFd& file) {
     UniqueFd opened(::open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
     if (!opened)
         return failToLock(path, std::strerror(errno));
-    if (waitForLock(opened.get(), path) < 0)
+    if (waitForFileLock(opened.get(), path) < 0)
         return -1;
     file = std::move(opened);
     return 0;

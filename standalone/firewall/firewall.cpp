@@ -10,6 +10,7 @@
 #include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/ruleset.h"
 #include "standalone/settings/settings.h"
+#include "standalone/supervise/process_identity.h"
 
 #include <syslog.h>
 
@@ -20,9 +21,14 @@
 namespace velt {
 namespace {
 
-/// Stands while rules of ours are loaded; like these it is gone after a boot.
+/// Stands while rules of ours are loaded, with the boot of the machine in which they were: below a state root other than "/"
+/// the file outlives a boot, the rules do not.
 std::filesystem::path loadedMark() {
     return statePath("/run/velt/firewall.loaded");
+}
+
+bool rulesAreLoaded() {
+    return readFile(loadedMark()) == bootId();
 }
 
 /// For the administrator: why ports may be closed although we opened them.
@@ -35,7 +41,10 @@ std::string firstLine(const std::string& text) {
 }
 
 int failToLoad(const ProcessResult& result) {
-    const std::string reason = firstLine(result.errors);
+    std::string reason = firstLine(result.errors);
+    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
+        reason.pop_back(); // it may be a sentence of its own
+    }
     if (reason.find("Operation not permitted") != std::string::npos) {
         return fail(ErrorNumber::firewall,
                     "The firewall rules are not loaded: this process may not administer the network.");
@@ -64,13 +73,25 @@ void warnOfForeignTables() {
     }
 }
 
+/// The rules belong to the machine, so an installation below another root leaves them alone unless it was told about a
+/// firewall: its defaults would take away what the machine's own installation drops.
+bool mayTouchRules() {
+    std::error_code ignored;
+    return statePath("/") == "/" || std::filesystem::exists(statePath("/etc/velt/firewall.conf"), ignored);
+}
+
 int loadRules() {
-    const auto firewall = loadFirewallSettings();
+    if (!mayTouchRules()) {
+        return 0;
+    }
+    // Held until the rules are loaded: of two processes the one with the older settings must not load its rules last.
+    const StateLock lock;
+    const auto firewall = lock ? loadFirewallSettings() : std::nullopt;
     if (!firewall) {
         return -1;
     }
     std::error_code ignored;
-    if (firewall->mode == FirewallMode::off && !std::filesystem::exists(loadedMark(), ignored)) {
+    if (firewall->mode == FirewallMode::off && !rulesAreLoaded()) {
         return 0; // nothing to take away, and perhaps no right to do it
     }
     const auto ftp = loadFtpSettings();
@@ -79,7 +100,7 @@ int loadRules() {
         return -1;
     }
     // Before the rules, since a mark without rules does no harm.
-    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), "", 0644) < 0) {
+    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), bootId(), 0644) < 0) {
         return -1;
     }
     const ProcessResult result =

@@ -32,7 +32,9 @@ struct FirewallSettings {
 std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, const std::string& file);
 
 /// The settings of /etc/velt/firewall.conf below the state root, the defaults where there is none. Nothing, with
-/// the last error set, when the file cannot be read or is damaged.
+/// the last error set, when the file cannot be read or is damaged. The table belongs to the machine: an installation
+/// below a root other than "/" touches it only when that root has a file of its own, and takes its rules away again by
+/// the mode off, not by the removal of the file.
 std::optional<FirewallSettings> loadFirewallSettings();
 
 } // namespace velt

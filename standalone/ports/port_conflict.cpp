@@ -1,5 +1,3 @@
-#include "standalone/ports/port_conflict.h"
-
 #include "platform/webapi.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
@@ -142,8 +140,13 @@ std::vector<ProcessId> ownProcesses(const Question& question) {
 
 std::optional<Conflict> conflictWithListener(const Question& question, const ConfiguredPorts& ports) {
     std::vector<ListeningSocket> sockets = listeningSockets();
+    // A stored passive range may have a port less, since each session takes one that is free. A daemon's own port must be free,
+    // also when it is the stored one: the service may have been off.
+    const auto canDoWithout = [&](int port) {
+        return !question.isOnePort() && isOwnPort(question, ports, port);
+    };
     std::erase_if(sockets, [&](const ListeningSocket& socket) {
-        return !question.holds(socket.port) || isOwnPort(question, ports, socket.port);
+        return !question.holds(socket.port) || canDoWithout(socket.port);
     });
     if (sockets.empty()) {
         return std::nullopt;
@@ -188,10 +191,6 @@ int findConflict(const Question& question) {
 }
 
 } // namespace
-
-const std::string& lastPortHolder() {
-    return lastConflict.holder;
-}
 
 PortConflict lastPortConflict() {
     return lastConflict;

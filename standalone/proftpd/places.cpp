@@ -126,7 +126,8 @@ std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
     places.chrootRules = statePath("/etc/velt/chroot_rules");
     places.shareMap = ftpRunFolder() / "shares.map";
     places.shareRoot = ftpRunFolder() / "shares";
-    places.anonymousLink = ftpRunFolder() / "links" / "anonymous";
+    // As long as the place in the plan's own folder, whose name is known only when all of this is.
+    places.anonymousLink = ftpRunFolder() / "configurations" / std::string(64, '0') / "anonymous";
     places.ipv6 = hasIPv6();
     if (!isRenderable(places.anonymousLink) || !isRenderable(places.moduleFolder)) {
         fail(ErrorNumber::invalid, "The folder " + statePath("/").string() + " or " +

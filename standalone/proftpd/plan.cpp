@@ -57,6 +57,17 @@ int replaceLink(const std::filesystem::path& link, const std::filesystem::path& 
                  : 0;
 }
 
+/// Stands for all that a daemon reads at its start and nowhere else.
+std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
+    std::string all = renderProftpd(settings, found.places);
+    for (const std::string& part :
+         {found.anonymousFolder.string(), found.mounts, found.certificateFingerprint,
+          installedFile("velt-share-root").string()}) {
+        all += '\0' + part;
+    }
+    return sha256(all);
+}
+
 int writeSurroundings(const FtpSurroundings& found) {
     const auto& places = found.places;
     if (makeFolder(places.runFolder) < 0 || makeFolder(places.shareRoot) < 0 ||
@@ -67,35 +78,25 @@ int writeSurroundings(const FtpSurroundings& found) {
     return refreshShareMap();
 }
 
-std::vector<std::string> argumentsOf(const FtpSettings& settings, const FtpSurroundings& found,
-                                     const std::filesystem::path& configuration,
-                                     const std::filesystem::path& mountList) {
-    std::vector<std::string> arguments;
-    if (needsShareRoot(settings) && !found.places.accountFiles) {
-        arguments = {installedFile("velt-share-root"), mountList, found.places.shareRoot};
-    }
-    // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
-    arguments.insert(arguments.end(), {program, "-n", "-c", configuration.string()});
-    return arguments;
-}
-
-std::optional<DaemonPlan> writePlan(const FtpSettings& settings, const FtpSurroundings& found) {
-    const auto configuration = found.places.runFolder / "proftpd.conf";
-    const auto mountList = found.places.runFolder / "mounts";
-    const std::string text = renderProftpd(settings, found.places);
-    if (writeSurroundings(found) < 0 || replaceFile(configuration, text, 0600) < 0 ||
+std::optional<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found) {
+    DaemonPlan plan;
+    plan.configurationHash = hashOf(settings, found);
+    plan.folder = found.places.runFolder / "configurations" / plan.configurationHash;
+    found.places.anonymousLink = plan.folder / "anonymous";
+    const auto configuration = plan.folder / "proftpd.conf";
+    const auto mountList = plan.folder / "mounts";
+    if (writeSurroundings(found) < 0 ||
+        replaceFile(configuration, renderProftpd(settings, found.places), 0600) < 0 ||
         replaceFile(mountList, found.mounts, 0600) < 0) {
         return std::nullopt;
     }
-    DaemonPlan plan;
-    plan.arguments = argumentsOf(settings, found, configuration, mountList);
+    if (needsShareRoot(settings) && !found.places.accountFiles) {
+        plan.arguments = {installedFile("velt-share-root"), mountList, found.places.shareRoot};
+    }
+    // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
+    plan.arguments.insert(plan.arguments.end(), {program, "-n", "-c", configuration.string()});
     plan.executable = program;
     plan.listenPorts = {std::atoi(settings.record.portnum)};
-    std::string all = text + '\0' + found.mounts + '\0' + found.certificateFingerprint;
-    for (const auto& argument : plan.arguments) {
-        all += '\0' + argument;
-    }
-    plan.configurationHash = sha256(all);
     return plan;
 }
 

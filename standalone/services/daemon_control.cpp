@@ -1,14 +1,17 @@
 #include "standalone/services/daemon_control.h"
 
+#include "platform/firewall.h"
+#include "standalone/core/file_lock.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/unique_fd.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/services/service_backend.h"
+#include "standalone/settings/candidate.h"
 #include "standalone/settings/settings.h"
 
 #include <fcntl.h>
-#include <sys/file.h>
 #include <sys/stat.h>
+#include <syslog.h>
 
 #include <array>
 #include <cerrno>
@@ -41,14 +44,12 @@ public:
         }
         const std::filesystem::path file = directory / (nameOf(daemon) + ".operation");
         descriptor_ = UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
-        int result = descriptor_ ? 0 : -1;
-        while (descriptor_ && (result = ::flock(descriptor_.get(), LOCK_EX)) != 0 && errno == EINTR) {
-        }
-        if (result != 0) {
+        if (!descriptor_) {
             fail(ErrorNumber::store,
                  "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
+            return;
         }
-        held_ = result == 0;
+        held_ = waitForFileLock(descriptor_.get(), file) >= 0;
     }
 
     explicit operator bool() const { return held_; }
@@ -62,17 +63,38 @@ bool ftpIsWanted(const FtpSettings& settings) {
     return (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
 }
 
-/// The ports that the stored settings ask for; none when the settings do not want the daemon or cannot be read.
-std::vector<int> wantedPorts(Daemon daemon) {
+/// What a stop for a restart needs to know of the stored settings.
+struct NextStart {
+    bool wanted = false;  ///< false also when the settings cannot be read
+    bool possible = true; ///< else the last error says why not
+};
+
+/// The configuration's test takes the daemon's time, so nothing is tested where nothing runs.
+NextStart nextStart(Daemon daemon, const ServiceState& now) {
+    const bool serving = isServing(now);
+    const auto portIsFree = [&now](int port) { return probePorts({port}, now.daemon.pid) >= 0; };
     if (daemon == Daemon::ftp) {
         const auto settings = loadFtpSettings();
-        if (settings && ftpIsWanted(*settings)) {
-            return {controlPort(settings->record)};
+        if (!settings || !ftpIsWanted(*settings)) {
+            return {};
         }
-    } else if (const auto settings = loadSftpSettings(); settings && settings->enabled) {
-        return {settings->port};
+        return {true,
+                !serving || (portIsFree(controlPort(settings->record)) && testFtpCandidate(*settings) >= 0)};
     }
-    return {};
+    const auto settings = loadSftpSettings();
+    if (!settings || !settings->enabled) {
+        return {};
+    }
+    return {true, !serving || (portIsFree(settings->port) && testSftpCandidate(*settings) >= 0)};
+}
+
+/// After a start or a stop with this result: the rules open the ports of what is enabled, which may have changed although no
+/// port did. A daemon that did what was asked of it has not failed because of them.
+int followedByFirewall(int result) {
+    if (result >= 0 && VELTFwRuleHup() < 0) {
+        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    }
+    return result;
 }
 
 } // namespace
@@ -100,16 +122,20 @@ int startDaemon(Daemon daemon) {
             return -1;
         }
         if (!ftpIsWanted(*settings)) {
-            return backend->stop();
+            return followedByFirewall(backend->stop());
         }
     }
     const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
-    return plan ? backend->start(*plan) : -1;
+    if (!plan || backend->start(*plan) < 0) {
+        return -1;
+    }
+    removeFormerPlans(*plan);
+    return followedByFirewall(0);
 }
 
 int stopDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
-    return lock ? makeServiceBackend(nameOf(daemon))->stop() : -1;
+    return lock ? followedByFirewall(makeServiceBackend(nameOf(daemon))->stop()) : -1;
 }
 
 int stopDaemonForRestart(Daemon daemon) {
@@ -118,11 +144,13 @@ int stopDaemonForRestart(Daemon daemon) {
         return -1;
     }
     const auto backend = makeServiceBackend(nameOf(daemon));
-    const ServiceState now = backend->state();
-    if (isServing(now) && probePorts(wantedPorts(daemon), now.daemon.pid) < 0) {
+    const NextStart next = nextStart(daemon, backend->state());
+    if (!next.possible) {
         return -1;
     }
-    return backend->stop();
+    // What is still wanted is started next, and the firewall follows that.
+    const int result = backend->stop();
+    return next.wanted ? result : followedByFirewall(result);
 }
 
 int pauseDaemon(Daemon daemon) {

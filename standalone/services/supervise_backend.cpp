@@ -73,19 +73,24 @@ int spawnDetached(std::vector<std::string> arguments, int report) {
     return error;
 }
 
-/// What comes out of the pipe until its end, or until the limit has passed.
-std::string readReport(int descriptor) {
+/// What comes out of the pipe until its end; nothing when that does not come within the limit.
+std::optional<std::string> readReport(int descriptor) {
+    using Clock = std::chrono::steady_clock;
+    const auto deadline = Clock::now() + startLimit;
     std::string report;
     std::array<char, 4096> buffer{};
-    pollfd event{descriptor, POLLIN, 0};
-    while (::poll(&event, 1, static_cast<int>(startLimit.count())) > 0) {
-        const ssize_t length = ::read(descriptor, buffer.data(), buffer.size());
-        if (length <= 0) {
-            break;
+    for (;;) {
+        const auto left = std::chrono::duration_cast<milliseconds>(deadline - Clock::now());
+        pollfd event{descriptor, POLLIN, 0};
+        if (left.count() <= 0 || ::poll(&event, 1, static_cast<int>(left.count())) == 0) {
+            return std::nullopt;
+        }
+        const ssize_t length = event.revents != 0 ? ::read(descriptor, buffer.data(), buffer.size()) : 0;
+        if (event.revents != 0 && length <= 0) {
+            return report;
         }
         report.append(buffer.data(), static_cast<std::size_t>(length));
     }
-    return report;
 }
 
 } // namespace
@@ -136,13 +141,16 @@ int SuperviseBackend::launchSupervisor(const std::filesystem::path& directory, c
         return failToStart(program + " cannot be started: " + std::strerror(error));
     }
     writeEnd.reset();
-    const std::string report = readReport(readEnd.get());
+    const auto report = readReport(readEnd.get());
     constexpr std::string_view failure = "failed ";
-    if (report == "ready") {
+    if (!report) {
+        return failToStart("its supervisor does not report in time");
+    }
+    if (*report == "ready") {
         return 0;
     }
-    return failToStart(report.starts_with(failure) ? report.substr(failure.size())
-                                                   : "its supervisor ended without a reason");
+    return failToStart(report->starts_with(failure) ? report->substr(failure.size())
+                                                    : "its supervisor ended without a reason");
 }
 
 int SuperviseBackend::failToStart(const std::string& reason) const {

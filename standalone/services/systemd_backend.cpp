@@ -5,6 +5,7 @@
 #include "standalone/core/process.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/services/systemd_unit.h"
+#include "standalone/supervise/last_words.h"
 
 #include <algorithm>
 #include <charconv>
@@ -21,12 +22,9 @@ constexpr milliseconds startLimit{4700};
 constexpr milliseconds pollInterval{20};
 constexpr milliseconds patience{2000};
 
-std::string oneLine(std::string text) {
+std::string withoutLineEnd(std::string text) {
     while (!text.empty() && text.back() == '\n') {
         text.pop_back();
-    }
-    for (auto end = text.find('\n'); end != std::string::npos; end = text.find('\n', end)) {
-        text.replace(end, 1, " | ");
     }
     return text;
 }
@@ -37,7 +35,7 @@ SystemdBackend::SystemdBackend(std::string daemon, SystemdPlaces places)
     : daemon_(std::move(daemon)), places_(std::move(places)) {}
 
 std::string SystemdBackend::property(const std::string& name) const {
-    return oneLine(
+    return withoutLineEnd(
         runProcess({places_.systemctl, "show", "--value", "--property=" + name, unitName(daemon_)}).output);
 }
 
@@ -59,12 +57,13 @@ ServiceState SystemdBackend::state() const {
         state.state = RunState::running;
     } else if (active == "failed" || active == "activating") {
         state.state = RunState::failed;
-        state.reason = lastLines();
+        state.reason = reasonInJournal();
     }
     return state;
 }
 
 int SystemdBackend::start(const DaemonPlan& plan) {
+    const auto deadline = Clock::now() + startLimit;
     const ServiceState now = state();
     if (isServing(now) && now.configurationHash == plan.configurationHash) {
         return 0;
@@ -73,11 +72,12 @@ int SystemdBackend::start(const DaemonPlan& plan) {
         return -1;
     }
     const ProcessResult started =
-        runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
+        runProcess({places_.systemctl, "restart", unitName(daemon_)}, {},
+                   std::chrono::duration_cast<milliseconds>(deadline - Clock::now()));
     if (started.exitCode != 0) {
-        return failedToStart(daemon_, oneLine(started.errors));
+        return failedToStart(daemon_, lastWords(started.errors));
     }
-    return waitUntilServing();
+    return waitUntilServing(deadline);
 }
 
 int SystemdBackend::writeUnit(const DaemonPlan& plan) const {
@@ -86,19 +86,18 @@ int SystemdBackend::writeUnit(const DaemonPlan& plan) const {
         return -1;
     }
     const ProcessResult reloaded = runProcess({places_.systemctl, "daemon-reload"});
-    return reloaded.exitCode == 0 ? 0 : failedToStart(daemon_, oneLine(reloaded.errors));
+    return reloaded.exitCode == 0 ? 0 : failedToStart(daemon_, lastWords(reloaded.errors));
 }
 
-int SystemdBackend::waitUntilServing() const {
-    const auto deadline = std::chrono::steady_clock::now() + startLimit;
+int SystemdBackend::waitUntilServing(Clock::time_point deadline) const {
     for (;;) {
         const ServiceState now = state();
         if (isServing(now)) {
             return 0;
         }
-        const bool late = std::chrono::steady_clock::now() >= deadline;
+        const bool late = Clock::now() >= deadline;
         if (now.state == RunState::failed || late) {
-            const std::string words = lastLines();
+            const std::string words = reasonInJournal();
             runProcess({places_.systemctl, "stop", unitName(daemon_)});
             return failedToStart(daemon_, late && words.empty() ? "it does not listen in time" : words);
         }
@@ -106,10 +105,10 @@ int SystemdBackend::waitUntilServing() const {
     }
 }
 
-std::string SystemdBackend::lastLines() const {
-    return oneLine(runProcess({places_.journalctl, "--unit=" + unitName(daemon_), "--lines=5", "--output=cat",
-                               "--no-pager"})
-                       .output);
+std::string SystemdBackend::reasonInJournal() const {
+    return lastWords(runProcess({places_.journalctl, "--unit=" + unitName(daemon_), "--lines=5",
+                                 "--output=cat", "--no-pager"})
+                         .output);
 }
 
 int SystemdBackend::endListener() const {
@@ -120,7 +119,7 @@ int SystemdBackend::endListener() const {
     const ProcessResult stopped = runProcess({places_.systemctl, "stop", unitName(daemon_)});
     if (stopped.exitCode != 0) {
         return fail(ErrorNumber::daemon,
-                    daemonTitle(daemon_) + " cannot be stopped: " + oneLine(stopped.errors) + ".");
+                    daemonTitle(daemon_) + " cannot be stopped: " + lastWords(stopped.errors) + ".");
     }
     return 0;
 }

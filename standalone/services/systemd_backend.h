@@ -4,6 +4,7 @@
 
 #include "standalone/services/service_backend.h"
 
+#include <chrono>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -29,12 +30,14 @@ public:
     ServiceState state() const override;
 
 private:
+    using Clock = std::chrono::steady_clock;
+
     int writeUnit(const DaemonPlan& plan) const;
-    int waitUntilServing() const;
+    int waitUntilServing(Clock::time_point deadline) const;
     int endListener() const;
     std::string property(const std::string& name) const;
     std::vector<ProcessId> unitProcesses(const std::string& controlGroup) const;
-    std::string lastLines() const;
+    std::string reasonInJournal() const;
 
     std::string daemon_;
     SystemdPlaces places_;

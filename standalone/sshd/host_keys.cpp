@@ -5,6 +5,7 @@
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemon_test.h"
+#include "standalone/supervise/last_words.h"
 
 #include <string>
 

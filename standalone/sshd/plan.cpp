@@ -66,15 +66,19 @@ std::optional<DaemonPlan> planSftpDaemon() {
         return std::nullopt;
     }
     const auto text = rendering(*settings);
-    const auto configuration = statePath("/run/velt/sshd_config");
-    if (!text || testRendering(*text) < 0 || replaceFile(configuration, *text, 0600) < 0) {
+    if (!text || testRendering(*text) < 0) {
         return std::nullopt;
     }
     DaemonPlan plan;
+    plan.configurationHash = sha256(*text);
+    plan.folder = statePath("/run/velt/sftp/configurations") / plan.configurationHash;
+    const auto configuration = plan.folder / "sshd_config";
+    if (replaceFile(configuration, *text, 0600) < 0) {
+        return std::nullopt;
+    }
     plan.arguments = {program, "-D", "-e", "-f", configuration.string()};
     plan.executable = program;
     plan.listenPorts = {settings->port};
-    plan.configurationHash = sha256(*text + '\0' + configuration.string());
     return plan;
 }
 

@@ -1,6 +1,7 @@
 #include "standalone/supervise/daemon_process.h"
 
 #include "standalone/ports/listening_sockets.h"
+#include "standalone/supervise/last_words.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -50,13 +51,6 @@ public:
     posix_spawn_file_actions_t actions{};
     posix_spawnattr_t attributes{};
 };
-
-std::string describeEnd(int waitStatus) {
-    if (WIFSIGNALED(waitStatus)) {
-        return "it was ended by signal " + std::to_string(WTERMSIG(waitStatus));
-    }
-    return "it ended with status " + std::to_string(WEXITSTATUS(waitStatus));
-}
 
 /// The ports as people write them: "2121, 2122".
 std::string listPorts(const std::vector<int>& ports) {
@@ -134,7 +128,9 @@ std::string DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::t
             ::waitpid(id_.pid, &status, 0);
             readOutput();
             id_ = {};
-            return withLastLines("it did not listen on port " + listPorts(order.ports) + " in time");
+            const std::string words = takeLastWords();
+            return "it did not listen on port " + listPorts(order.ports) + " in time" +
+                   (words.empty() ? "" : ": " + words);
         }
         pollfd output{readEnd_, POLLIN, 0};
         ::poll(&output, 1, 2);
@@ -144,19 +140,22 @@ std::string DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::t
 std::string DaemonProcess::ended(int waitStatus) {
     readOutput();
     id_ = {};
-    return withLastLines(describeEnd(waitStatus));
+    std::string words = takeLastWords();
+    if (WIFSIGNALED(waitStatus)) { // then its words were about something else
+        return "it was ended by signal " + std::to_string(WTERMSIG(waitStatus));
+    }
+    return words.empty() ? "it ended with status " + std::to_string(WEXITSTATUS(waitStatus)) : words;
 }
 
-std::string DaemonProcess::withLastLines(std::string reason) {
+std::string DaemonProcess::takeLastWords() {
     if (!partialLine_.empty()) {
         takeLine(std::exchange(partialLine_, {}));
     }
-    const char* separator = ": ";
+    std::string lines;
     for (const std::string& line : lastLines_) {
-        reason += separator + line;
-        separator = " | ";
+        lines += line + '\n';
     }
-    return reason;
+    return lastWords(lines);
 }
 
 void DaemonProcess::readOutput() {
@@ -171,6 +170,8 @@ void DaemonProcess::readOutput() {
                 takeLine(std::exchange(partialLine_, {}));
             } else if (partialLine_.size() < longestLine) {
                 partialLine_ += character;
+            } else if (partialLine_.size() == longestLine) {
+                partialLine_ += "…"; // so that nobody takes it for the whole; a full stop would be taken off
             }
         }
     }

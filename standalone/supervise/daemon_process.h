@@ -29,13 +29,14 @@ public:
     DaemonProcess(const DaemonProcess&) = delete;
     DaemonProcess& operator=(const DaemonProcess&) = delete;
 
-    /// Starts the daemon and waits until it listens. "" when it does; else why it does not, in one line, and it is gone.
+    /// Starts the daemon and waits until it listens. "" when it does; else why it does not, in the daemon's own words where it has
+    /// some, and it is gone. All that it writes goes to syslog.
     std::string start(const DaemonOrder& order, Clock::time_point deadline);
 
     /// The running daemon; no process before a start and after ended().
     const ProcessId& id() const { return id_; }
 
-    /// To be told when the daemon was reaped with this status; returns its end in words, with its last lines.
+    /// To be told when the daemon was reaped with this status; returns why, as start() does.
     std::string ended(int waitStatus);
 
     /// Becomes readable when the daemon has written something, which readOutput() then takes.
@@ -45,7 +46,7 @@ public:
 private:
     std::string spawn(const DaemonOrder& order);
     std::string waitUntilListening(const DaemonOrder& order, Clock::time_point deadline);
-    std::string withLastLines(std::string reason);
+    std::string takeLastWords();
     void takeLine(std::string line);
 
     int readEnd_ = -1;

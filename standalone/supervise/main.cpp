@@ -98,7 +98,9 @@ int main(int argc, char** argv) {
         return 2;
     }
     velt::DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
-    const std::string ident = std::string("velt-supervise ") + argv[2];
+    // What the daemons write goes there as well, the reasons of refused logins among it, so it is under their names.
+    const std::string ident =
+        std::string_view(argv[2]) == "sftp" ? "velt-sftpd" : std::string("velt-") + argv[2];
     ::openlog(ident.c_str(), LOG_PID, LOG_DAEMON);
     detach();
     try {

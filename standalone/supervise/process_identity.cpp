@@ -93,6 +93,13 @@ std::vector<ProcessId> descendantsAmong(const std::vector<Relation>& all, pid_t 
 
 } // namespace
 
+std::string bootId() {
+    std::ifstream file("/proc/sys/kernel/random/boot_id");
+    std::string id;
+    std::getline(file, id);
+    return id;
+}
+
 std::optional<ProcessId> identifyProcess(pid_t pid) {
     const auto stat = readStat(pid);
     if (!stat || hasEnded(*stat)) {

@@ -8,6 +8,7 @@
 #include <chrono>
 #include <functional>
 #include <optional>
+#include <string>
 #include <vector>
 
 namespace velt {
@@ -19,6 +20,10 @@ struct ProcessId {
     explicit operator bool() const { return pid > 0; }
     bool operator==(const ProcessId&) const = default;
 };
+
+/// What tells this boot of the machine from every other. A process is named by its ProcessId within one boot only, so files that
+/// may outlive it note this beside one.
+std::string bootId();
 
 /// The process that has this pid now; nothing when there is none or it has ended and only waits to be reaped.
 std::optional<ProcessId> identifyProcess(pid_t pid);

@@ -14,7 +14,8 @@
 namespace velt {
 namespace {
 
-constexpr std::string_view firstLine = "velt-supervise 1";
+constexpr std::string_view firstLine = "velt-supervise 2";
+constexpr std::string_view bootKey = "boot ";
 
 constexpr std::array<std::pair<RunState, std::string_view>, 3> stateNames{{
     {RunState::running, "running"},
@@ -83,7 +84,7 @@ std::string render(const ServiceState& state) {
             text << key << ' ' << process.pid << ' ' << process.startTime << '\n';
         }
     };
-    text << firstLine << '\n' << "state " << nameOf(state.state) << '\n';
+    text << firstLine << '\n' << bootKey << bootId() << '\n' << "state " << nameOf(state.state) << '\n';
     processLine("supervisor", state.supervisor);
     processLine("daemon", state.daemon);
     text << "configuration " << oneLine(state.configurationHash) << '\n';
@@ -113,6 +114,9 @@ std::optional<ServiceState> readServiceState(const std::filesystem::path& file) 
     std::ifstream input(file);
     std::string line;
     if (!std::getline(input, line) || line != firstLine) {
+        return std::nullopt;
+    }
+    if (!std::getline(input, line) || line != std::string(bootKey) + bootId()) {
         return std::nullopt;
     }
     ServiceState state;

@@ -4,6 +4,7 @@
 #include "standalone/core/last_error.h"
 
 #include <filesystem>
+#include <iterator>
 
 namespace velt::test {
 namespace {
@@ -23,8 +24,9 @@ TEST_F(FtpPlan, namesTheDaemonAndItsPort) {
     hash();
     const auto plan = planFtpDaemon();
     ASSERT_TRUE(plan) << lastErrorSentence();
-    EXPECT_EQ(plan->arguments, (std::vector<std::string>{"/usr/sbin/proftpd", "-n", "-c",
-                                                         worldRoot / "run/velt/ftp/proftpd.conf"}));
+    EXPECT_EQ(plan->folder, worldRoot / "run/velt/ftp/configurations" / plan->configurationHash);
+    EXPECT_EQ(plan->arguments,
+              (std::vector<std::string>{"/usr/sbin/proftpd", "-n", "-c", plan->folder / "proftpd.conf"}));
     EXPECT_EQ(plan->executable, "/usr/sbin/proftpd");
     EXPECT_EQ(plan->listenPorts, std::vector<int>{2121});
 }
@@ -69,14 +71,38 @@ TEST_F(FtpPlan, isRefusedWhenNeitherServiceIsEnabled) {
     EXPECT_EQ(lastErrorSentence(), "Neither FTP nor FTPS is enabled.");
 }
 
-TEST_F(FtpPlan, keepsTheFormerConfigurationWhenTheDaemonRefusesTheNewOne) {
+TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {
+    addShare("one", "one", ShareGrant::read);
+    addShare("two", "two", ShareGrant::read);
+    letAnonymousIn("one");
+    hash();
+    const auto former = planFtpDaemon();
+    letAnonymousIn("two");
+    hash();
+    const auto next = planFtpDaemon();
+    ASSERT_TRUE(former && next) << lastErrorSentence();
+    EXPECT_NE(former->folder, next->folder);
+    EXPECT_TRUE(fs::exists(former->folder / "proftpd.conf"));
+    EXPECT_EQ(fs::read_symlink(former->folder / "anonymous"), "/mnt/srv/one");
+    EXPECT_EQ(fs::read_symlink(next->folder / "anonymous"), "/mnt/srv/two");
+    removeFormerPlans(*next);
+    EXPECT_FALSE(fs::exists(former->folder));
+    EXPECT_TRUE(fs::exists(next->folder / "proftpd.conf"));
+    EXPECT_TRUE(fs::exists("/mnt/srv/one")) << "a link is removed, not what it leads to";
+}
+
+TEST_F(FtpPlan, writesNothingWhenTheDaemonRefusesTheNewConfiguration) {
     offerTls(true);
     hash();
-    const std::string before = readFileText(worldRoot / "run/velt/ftp/proftpd.conf");
+    const auto configurations = worldRoot / "run/velt/ftp/configurations";
+    const auto count = [&] {
+        return std::distance(fs::directory_iterator(configurations), fs::directory_iterator());
+    };
+    EXPECT_EQ(count(), 1);
     fs::create_directories(worldRoot / "etc/velt/tls");
     writeFile(worldRoot / "etc/velt/tls/server.crt", "nonsense");
     EXPECT_FALSE(planFtpDaemon());
-    EXPECT_EQ(readFileText(worldRoot / "run/velt/ftp/proftpd.conf"), before);
+    EXPECT_EQ(count(), 1);
 }
 
 TEST_F(FtpPlan, leavesAStoredRuleSetAlone) {

@@ -11,11 +11,16 @@
 #include "tests/system/support/private_world.h"
 
 #include <gtest/gtest.h>
+
+#include <netinet/in.h>
+#include <sys/socket.h>
 #include <unistd.h>
 
 #include <chrono>
 #include <csignal>
+#include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <string>
 #include <thread>
@@ -25,6 +30,24 @@ namespace {
 namespace fs = std::filesystem;
 using std::chrono::milliseconds;
 using std::chrono::seconds;
+
+/// Listens on the port as another program would.
+class TakenPort {
+public:
+    explicit TakenPort(int atPort) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+        sockaddr_in address{};
+        address.sin_family = AF_INET;
+        address.sin_port = htons(static_cast<in_port_t>(atPort));
+        EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+        EXPECT_EQ(::listen(descriptor_, 1), 0);
+    }
+    ~TakenPort() { ::close(descriptor_); }
+    TakenPort(const TakenPort&) = delete;
+    TakenPort& operator=(const TakenPort&) = delete;
+
+private:
+    int descriptor_;
+};
 
 class ControlledServices : public FtpService {
 protected:
@@ -86,6 +109,28 @@ TEST_F(ControlledServices, aKilledFtpDaemonIsUpAgainWithinTwoSeconds) {
     EXPECT_TRUE(servesFtp(2121));
 }
 
+TEST_F(ControlledServices, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
+    addShare("music", "music", ShareGrant::none);
+    record.user_chroot = 0; // the share root's list has to come back as well
+    storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
+    const ProcessId daemon = serviceState("ftpd").daemon;
+    addShare("films", "films", ShareGrant::none);
+    std::strcpy(record.portnum, "2123");
+    ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    {
+        const TakenPort taken(2123);
+        EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
+        EXPECT_EQ(serviceState("ftpd").daemon, daemon);
+        signalProcess(daemon, SIGKILL);
+        EXPECT_TRUE(isBack("ftpd", daemon));
+        const ProcessResult listing =
+            curl({"--list-only", "--user", "alice:alice-secret", "ftp://127.0.0.1:2121//"});
+        EXPECT_EQ(listing.output, "music\r\n");
+    }
+    EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(isServing(serviceState("ftpd")));
+}
+
 TEST_F(ControlledServices, unconfinedUsersHaveTheirShareRootThroughTheSupervisor) {
     addShare("music", "music", ShareGrant::none);
     record.user_chroot = 0;
@@ -145,6 +190,17 @@ TEST_F(ControlledSftp, aTransferOutlivesAPauseAndAMove) {
     EXPECT_EQ(readFileText("/mnt/control-got").size(), 300000U);
     EXPECT_NE(fetchSlowly(2222).exitCode, 0) << "the former port is closed";
     EXPECT_NE(VELTSFTPIsAlive(), 0);
+}
+
+TEST_F(ControlledSftp, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    const ProcessId daemon = serviceState("sftp").daemon;
+    ASSERT_EQ(VELTSFTPConfigSet(1, 2223), 0) << lastErrorSentence();
+    const TakenPort taken(2223);
+    EXPECT_LT(VLIBServiceStart("sftp", 0), 0);
+    signalProcess(daemon, SIGKILL);
+    EXPECT_TRUE(isBack("sftp", daemon));
+    EXPECT_EQ(fetchSlowly(2222).exitCode, 0);
 }
 
 TEST_F(ControlledSftp, aStopEndsTheTransfer) {

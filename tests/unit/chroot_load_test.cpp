@@ -92,6 +92,16 @@ TEST_F(ChrootLoadTest, AnswersWithNoRulesWhenNoLineCanBeParsed) {
               (Lines{alloc, enumerate, parse("x"), parse("y"), freeList, succeeded(noRules)}));
 }
 
+TEST_F(ChrootLoadTest, TakesAnyFlagButZeroForAUsersRule) {
+    platform.rules = {"user:1001:/home", "group:2001:/home"};
+    for (const int flag : {-1, 2, 256}) {
+        platform.userFlag = flag;
+        EXPECT_EQ(run(FTPChrootUserLoad).back(),
+                  answered(homeRule("user", "alice") + "," + homeRule("group", "staff"), 2))
+            << flag;
+    }
+}
+
 TEST_F(ChrootLoadTest, KeepsWhatAParserLeavesAloneFromTheLineBefore) {
     platform.rules = {"user:1001:/home", "second", "group:2001:/home", "fourth"};
     for (const int nth : {2, 4}) {
@@ -150,16 +160,23 @@ TEST_F(ChrootLoadTest, FailsWithoutAList) {
     EXPECT_EQ(text.substr(text.find(' ')), " Failed to malloc for list.[0x002A rule.c:7]");
 }
 
+TEST_F(ChrootLoadTest, AsksForTheLastErrorOnceInTheOrderOfTheFailuresLogLine) {
+    platform.journalErrorGets = true;
+    platform.fail("VELTFTPChrootRuleEnum");
+    EXPECT_EQ(run(FTPChrootUserLoad),
+              (Lines{alloc, enumerate, "VLIBCErrGet()", "VLIBCErrorGetFile()", "VLIBCErrorGetLine()",
+                     failureOf("Failed to VELTFTPChrootRuleEnum()."), freeList} +
+               failed("chroot", 1902, "{}")));
+}
+
 TEST_F(ChrootLoadTest, FreesTheListWhenTheRulesCannotBeListed) {
     for (const bool replaced : {false, true}) {
-        platform.reset();
-        platform.lastError = {0x2A, "rule.c", 7};
+        startAfresh();
         platform.failedEnumeratorsReplaceList = replaced;
         platform.fail("VELTFTPChrootRuleEnum");
         EXPECT_EQ(run(FTPChrootUserLoad),
                   (Lines{alloc, enumerate, failureOf("Failed to VELTFTPChrootRuleEnum()."), freeList} +
                    failed("chroot", 1902, "{}")));
-        EXPECT_EQ(platform.handleErrors(), Lines{});
     }
 }
 

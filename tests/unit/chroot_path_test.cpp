@@ -18,6 +18,7 @@ namespace fs = std::filesystem;
 ///   media/a/b    a folder in a folder
 ///   media/file   a regular file
 ///   media/pipe   a named pipe
+///   media/socket a local socket
 class ChrootPathTest : public HandlerTest {
 protected:
     void SetUp() override {
@@ -28,6 +29,7 @@ protected:
         fs::create_directories(folder() / "a" / "b");
         std::ofstream(folder() / "file") << "text";
         ASSERT_EQ(mkfifo((folder() / "pipe").c_str(), 0600), 0);
+        ASSERT_EQ(mknod((folder() / "socket").c_str(), S_IFSOCK | 0600, 0), 0);
         platform.shares["media"].path = folder().string();
         platform.users = {{"alice", {"", 1001}}};
     }
@@ -39,7 +41,8 @@ protected:
 
     fs::path folder() const { return root_ / "media"; }
 
-    /// Loads one rule with `path` and returns its "path_exist". Exactly the share `share` must have been looked up.
+    /// Loads one rule with `path` and returns its "path_exist". Exactly the share `share` must have been
+    /// looked up.
     bool exists(const std::string& path, const std::string& share) {
         const int sharesBefore = sharesFound_;
         sharesFound_ += platform.shares.contains(share) ? 1 : 0;
@@ -140,6 +143,7 @@ TEST_F(ChrootPathTest, IsMissingWhereSomethingOtherThanAFolderStands) {
     EXPECT_FALSE(exists("/media/file/", "media"));
     EXPECT_FALSE(exists("/media/file/a", "media"));
     EXPECT_FALSE(exists("/media/pipe", "media"));
+    EXPECT_FALSE(exists("/media/socket", "media")) << "its type has the bit of a folder's, and one more";
     platform.shares["text"].path = (folder() / "file").string();
     EXPECT_FALSE(exists("/text", "text"));
     platform.shares["null"].path = "/dev/null";

@@ -119,7 +119,7 @@ TEST_F(ChrootSaveTest, RemovesEveryRuleWhenTheRequestHoldsNoArray) {
     for (const char* const params :
          {"{}", "null", R"({"rules":null})", R"({"rules":"all"})", R"({"rules":""})", R"({"rules":7})",
           R"({"rules":1.5})", R"({"rules":true})", R"({"rules":{}})", R"({"Rules":[7]})"}) {
-        platform.reset();
+        startAfresh();
         platform.rules = {"user:1:/old"};
         EXPECT_EQ(run(FTPChrootUserSave, params), begun() + savedAs({})) << params;
         EXPECT_EQ(platform.rules, Lines{}) << params;
@@ -128,7 +128,7 @@ TEST_F(ChrootSaveTest, RemovesEveryRuleWhenTheRequestHoldsNoArray) {
 
 TEST_F(ChrootSaveTest, TakesOnlyTheExactWordForAUser) {
     for (const char* const type : {"User", "USER", "useR", "user ", " user", "users", "group", "Group", ""}) {
-        platform.reset();
+        startAfresh();
         platform.users["staff"] = {"", 1001};
         platform.groups["staff"] = 2001;
         EXPECT_EQ(saveRules("[" + rule(type, "staff", "/a") + "]"),
@@ -154,6 +154,15 @@ TEST_F(ChrootSaveTest, DropsTheRuleOfAnUnknownGroupWithALogLine) {
                Lines{getGroup("alice"), unknown("VELTGroupGet", "alice"), getGroup("staff"),
                      format(0, 2001, "/b"), push("group:2001:/b")} +
                savedAs({"group:2001:/b"})));
+}
+
+TEST_F(ChrootSaveTest, AsksForTheLastErrorOnceInTheOrderOfTheLogLine) {
+    platform.journalErrorGets = true;
+    EXPECT_EQ(saveRules("[" + rule("user", "ghost", "/a") + "]"),
+              (begun() +
+               Lines{getUser("ghost"), "VLIBCErrGet()", "VLIBCErrorGetFile()", "VLIBCErrorGetLine()",
+                     unknown("VELTUserGet", "ghost")} +
+               savedAs({})));
 }
 
 TEST_F(ChrootSaveTest, DropsARuleThatCannotBeFormattedWithoutAMessage) {

@@ -70,7 +70,7 @@ protected:
 
     /// The processor time, in seconds, of a request with `count` names.
     double secondsToChange(int count) {
-        platform.reset();
+        startAfresh();
         // The platform's own work on the names is not what is measured.
         platform.fail(GetParam().operation, 1, 0);
         Lines names;
@@ -113,7 +113,7 @@ TEST_P(ChrootUserChangeTest, MovesTheUsersToTheOtherSet) {
 TEST_P(ChrootUserChangeTest, SkipsWhatIsNoTextWithoutAMessage) {
     const Lines names = {"bob", "alice"};
     EXPECT_EQ(change(R"(["bob",7,"alice"])"), begun(names) + applied(GetParam(), names));
-    platform.reset();
+    startAfresh();
     EXPECT_EQ(change(R"([null,true,1.5,"bob",[],["carol"],{},{"id":"dave"},-1,"alice"])"),
               begun(names) + applied(GetParam(), names));
 }
@@ -207,11 +207,11 @@ TEST_P(ChrootUserChangeTest, FreesTheListWhenAnExceptionPasses) {
     const std::string params = R"({"id":["bob"]})";
     platform.throwFrom("VLIBCSzListPush");
     EXPECT_EQ(runThrowing<fake::Thrown>(GetParam().entry, params), begun({"bob"}) + Lines{freeList});
-    platform.reset();
+    startAfresh();
     platform.throwFrom(GetParam().operation);
     EXPECT_EQ(runThrowing<fake::Thrown>(GetParam().entry, params),
               begun({"bob"}) + Lines({changed(GetParam(), {"bob"}), freeList}));
-    platform.reset();
+    startAfresh();
     platform.throwFrom("VELTLogSet1");
     EXPECT_EQ(runThrowing<fake::Thrown>(GetParam().entry, params),
               begun({"bob"}) + Lines{changed(GetParam(), {"bob"})} + entries(GetParam(), {"bob"}) +

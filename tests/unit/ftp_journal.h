@@ -1,4 +1,5 @@
-// What the tests of the FTP settings have in common: the journal lines of a "set", by the parts it is made of.
+// What the tests of the FTP settings have in common: the journal lines of a "set", by the parts it is made
+// of.
 #ifndef VELT_TESTS_UNIT_FTP_JOURNAL_H
 #define VELT_TESTS_UNIT_FTP_JOURNAL_H
 
@@ -25,8 +26,8 @@ Lines operator+(Lines first, const std::string& line);
 /// Parameters with both services off and `more` (`"key":value`, by commas), or with the given switches.
 std::string request(const std::string& more = "", bool ftp = false, bool ftps = false);
 
-/// The first calls of a "set" that passed its check: the services and the record are read. The record's bits do not
-/// matter here, only what the service controller says.
+/// The first calls of a "set" that passed its check: the services and the record are read. The record's bits
+/// do not matter here, only what the service controller says.
 Lines reads(bool ftpdEnabled = false);
 
 /// The end of a "set" that found nothing to apply.
@@ -54,8 +55,8 @@ Lines startsBoth();
 /// One entry of the administrator log.
 std::string entry(const std::string& event, const std::string& arg1 = "", const std::string& arg2 = "");
 
-/// A whole "set" with both services off before and after: `steps` are the calls from the reading of the record to its
-/// store, `differences` the fields that the store changes.
+/// A whole "set" with both services off before and after: `steps` are the calls from the reading of the
+/// record to its store, `differences` the fields that the store changes.
 Lines applied(const Lines& steps, const std::string& differences, bool reloadsFirewall = false);
 
 /// Puts the text of a control port, of at most 7 bytes, into a record.
@@ -65,12 +66,6 @@ void setPort(_tag_VELT_FTP_CONF_& conf, const char* text);
 class FTPTest : public HandlerTest {
 protected:
     static constexpr const char* useUtf8Get = "VELTFTPUseUTF8Get()";
-
-    /// The platform as at the beginning, for the next row of a table; what was before is checked like at a test's end.
-    void startAfresh() {
-        TearDown();
-        SetUp();
-    }
 };
 
 } // namespace ftptest

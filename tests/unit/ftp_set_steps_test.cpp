@@ -198,6 +198,13 @@ TEST_F(FTPSetStepTest, TheControlPortIsStoredAsTextOfAtMostSevenBytes) {
     }
 }
 
+TEST_F(FTPSetStepTest, AControlPortThatIsUnsignedDiffersFromAnEqualOne) {
+    Json::Value params = json(request());
+    params["portnum"] = Json::Value(21U);
+    EXPECT_EQ(runWith(FTPSet, params), Lines{getParams()} + R"(WebUtils::IsPortConflict("ftp", 21, 21))" +
+                                           applied({useUtf8Get}, "", true));
+}
+
 TEST_F(FTPSetStepTest, ThePassiveRangeIsStoredWhenAnEndDiffers) {
     const struct {
         int first = 0;
@@ -218,6 +225,8 @@ TEST_F(FTPSetStepTest, ThePassiveRangeIsStoredWhenAnEndDiffers) {
                 {50000, 0, "50000", std::nullopt},
                 {0, 50100, "no ports", "passive_port_max: 0"},
                 {50000, 50100, "no ports", "passive_port_min: 0, passive_port_max: 0"},
+                {50000, 50100, " ", "passive_port_min: 0, passive_port_max: 0"},
+                {50000, 50100, R"(\u00001:2)", "passive_port_min: 0, passive_port_max: 0"},
                 {50000, 50100, "50000-50100", "passive_port_max: 0"},
                 {0, 0, "-5:2147483647", "passive_port_min: -5, passive_port_max: 2147483647"}};
     for (const auto& row : rows) {
@@ -283,6 +292,7 @@ TEST_F(FTPSetStepTest, AnAddressAlwaysRestartsAndIsWrittenWhenItDiffers) {
                 {"", "203.0.113.7", "203.0.113.7"},
                 {std::nullopt, "no such key", "no such key"},
                 {std::nullopt, " ", " "},
+                {"203.0.113.7", R"(\u0000203.0.113.8)", ""},
                 {"203.0.113.7", "%s%n", "%s%n"},
                 {"1.1.1.1", "255.255.255.255", "255.255.255.255"},
                 {"1.1.1.1", "255.255.255.2551", "255.255.255.255"},

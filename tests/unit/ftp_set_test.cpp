@@ -64,7 +64,8 @@ protected:
             true, false);
     }
 
-    /// From the request to the store: everything is switched on. `utf8Set` is the call that sets the switch, if any.
+    /// From the request to the store: everything is switched on. `utf8Set` is the call that sets the switch,
+    /// if any.
     static Lines switchingOn(const Lines& utf8Set, const std::string& supportUtf8) {
         return Lines{getParams(), R"(WebUtils::IsPortConflict("ftp", 2121, 2121))",
                      R"(WebUtils::IsPortConflict("ftp", 50000, 50100))"} +

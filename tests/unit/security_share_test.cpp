@@ -23,8 +23,8 @@ protected:
         platform.lastError = {0x2A, "share.c", 7};
     }
 
-    /// Asks for access to "media". The handler has neither request nor response, so it would not get away with an
-    /// answer.
+    /// Asks for access to "media". The handler has neither request nor response, so it would not get away
+    /// with an answer.
     bool isAccessible() {
         FTPSecurityServiceHandler handler(nullptr, nullptr);
         platform.journal.clear();
@@ -131,7 +131,7 @@ TEST_F(ShareAccessTest, GrantsAccessByThePrivilegeOfTheFtpAccount) {
 
 TEST_F(ShareAccessTest, RefusesThePrivilegesNoneAndDenied) {
     for (const int privilege : {0, 4}) {
-        platform.reset();
+        startAfresh();
         platform.shares["media"].privilege = privilege;
         EXPECT_FALSE(isAccessible()) << privilege;
         EXPECT_EQ(platform.journal, (Lines{getShare, getPrivilege, freeShare}));

@@ -32,22 +32,22 @@ TEST_F(SecurityGetTest, TakesEachSettingFromItsOwnField) {
     run(FTPSecurityGet);
     EXPECT_EQ(answer().data, answerWith("user_chroot", "true"));
 
-    platform.reset();
+    startAfresh();
     platform.conf.anonymous = 1;
     run(FTPSecurityGet);
     EXPECT_EQ(answer().data, answerWith("anonymous", "true"));
 
-    platform.reset();
+    startAfresh();
     platform.conf.anonymous_chroot = 1;
     run(FTPSecurityGet);
     EXPECT_EQ(answer().data, answerWith("anonymous_chroot", "true"));
 
-    platform.reset();
+    startAfresh();
     std::strcpy(platform.conf.anonymous_chroot_share, "Public \"1\"");
     run(FTPSecurityGet);
     EXPECT_EQ(answer().data, answerWith("anonymous_chroot_share", R"("Public \"1\"")"));
 
-    platform.reset();
+    startAfresh();
     platform.umask = 1;
     run(FTPSecurityGet);
     EXPECT_EQ(answer().data, answerWith("enable_umask", "true"));

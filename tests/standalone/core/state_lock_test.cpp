@@ -1,8 +1,12 @@
+#include "standalone/core/file_lock.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/unique_fd.h"
 #include "tests/standalone/support/state_folder.h"
 
 #include <gtest/gtest.h>
+
+#include <fcntl.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -38,6 +42,17 @@ TEST_F(Lock, MayBeTakenAgainByItsThread) {
     }
     const StateLock again;
     EXPECT_TRUE(again);
+}
+
+TEST_F(Lock, OfAFileIsNotWaitedForForEver) {
+    const auto file = root_.path() / "operation";
+    const auto openFile = [&] { return UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600)); };
+    const UniqueFd holder = openFile();
+    const UniqueFd waiter = openFile();
+    ASSERT_EQ(waitForFileLock(holder.get(), file), 0) << lastErrorSentence();
+    EXPECT_LT(waitForFileLock(waiter.get(), file, std::chrono::milliseconds(50)), 0);
+    EXPECT_EQ(lastErrorSentence(),
+              "Cannot lock " + file.string() + ": another process has held it for 50 ms.");
 }
 
 TEST_F(Lock, KeepsOtherThreadsOutUntilTheOutermostGoes) {

@@ -2,6 +2,7 @@
 
 #include "ftp/ftp_library.h"
 #include "platform/firewall.h"
+#include "platform/service.h"
 #include "platform/sftp.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
@@ -9,6 +10,8 @@
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/firewall/private_network.h"
+#include "tests/standalone/services/plan_double.h"
+#include "tests/standalone/supervise/daemon_test.h"
 
 #include <gtest/gtest.h>
 
@@ -19,9 +22,13 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <atomic>
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <optional>
+#include <thread>
+#include <utility>
 
 namespace velt::test {
 namespace {
@@ -48,21 +55,22 @@ std::string listTable() {
     return runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).output;
 }
 
-class FirewallTest : public testing::Test {
+class FirewallTest : public DaemonTest {
 protected:
     void SetUp() override {
-        std::string folder = testing::TempDir() + "velt-firewall-XXXXXX";
-        ASSERT_NE(::mkdtemp(folder.data()), nullptr);
-        root_ = folder;
-        setStateRoot(root_);
+        DaemonTest::SetUp();
         network_.emplace();
         if (!network_->isThere() || runProcess({"nft", "list", "tables"}).exitCode != 0) {
             GTEST_SKIP() << "no private network here";
         }
         storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
+        setMode(""); // below this root no rule is touched without a file
     }
 
-    void TearDown() override { std::filesystem::remove_all(root_); }
+    void TearDown() override {
+        network_.reset(); // its other host is a process of ours
+        DaemonTest::TearDown();
+    }
 
     static void storeFtp(int port, int flags, int passiveFirst = 0, int passiveLast = 0) {
         _tag_VELT_FTP_CONF_ record{};
@@ -80,7 +88,6 @@ protected:
 
     static std::string warning() { return readFile(statePath("/run/velt/firewall.warning")).value_or(""); }
 
-    std::filesystem::path root_;
     std::optional<PrivateNetwork> network_;
 };
 
@@ -128,6 +135,51 @@ TEST_F(FirewallTest, TheRulesFollowThePorts) {
     EXPECT_FALSE(network_->neighbourReaches(2122));
 }
 
+TEST_F(FirewallTest, TheRulesFollowWhatIsEnabled) {
+    planDouble() = {};
+    planDouble().ftpOptions = planDouble().sftpOptions = {"--any"};
+    storeFtp(2121, 0);
+    ASSERT_EQ(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+    ASSERT_EQ(VELTSFTPConfigSet(1, 2222), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2222));
+    storeFtp(2121, 0);
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    ASSERT_EQ(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+    const OpenPort formerFtp(2121);
+    const OpenPort formerSftp(2222);
+    EXPECT_FALSE(network_->neighbourReaches(2121));
+    EXPECT_FALSE(network_->neighbourReaches(2222));
+}
+
+TEST_F(FirewallTest, RulesThatCannotBeLoadedKeepNoServiceDown) {
+    planDouble() = {};
+    setMode("mode = open");
+    EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+}
+
+TEST_F(FirewallTest, SettingsInTheMiddleOfAChangeAreWaitedFor) {
+    std::optional<StateLock> change(std::in_place);
+    std::atomic<bool> done = false;
+    std::thread loader([&done] {
+        EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+        done = true;
+    });
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    EXPECT_FALSE(done);
+    storeFtp(2122, VELT_FTP_SERVICE_PLAIN);
+    change.reset();
+    loader.join();
+    EXPECT_NE(listTable().find("2122"), std::string::npos) << listTable();
+}
+
 TEST_F(FirewallTest, OverlappingPortsAreOneSet) {
     setMode("mode = drop\nports = 2121 2100-2130 22");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
@@ -169,6 +221,18 @@ TEST_F(FirewallTest, AnotherFirewallThatDropsIsPointedOut) {
     EXPECT_EQ(warning(), "");
 }
 
+TEST_F(FirewallTest, AnInstallationElsewhereWithoutAFileLeavesTheRulesAlone) {
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::string before = listTable();
+    setStateRoot(root_ / "second");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(listTable(), before);
+    setMode("mode = accept");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), before);
+}
+
 TEST_F(FirewallTest, OtherTablesStay) {
     ASSERT_EQ(runProcess({"nft", "add", "table", "ip", "other"}).exitCode, 0);
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
@@ -187,6 +251,14 @@ TEST_F(FirewallTest, AListedEffectChangesNothing) {
     EXPECT_EQ(listTable(), "");
 }
 
+TEST_F(FirewallTest, AMarkFromBeforeABootIsNoSignOfRules) {
+    ASSERT_EQ(replaceFile(statePath("/run/velt/firewall.loaded"), "another boot", 0644), 0);
+    ASSERT_EQ(runProcess({"nft", "add", "table", "inet", "velt_fileserv"}).exitCode, 0);
+    setMode("mode = off");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), "") << "the table is somebody else's";
+}
+
 /// Runs in a child without the right to administer the network: its exit status is what `test` returns.
 template<class Test> int withoutRights(const Test& test) {
     const pid_t child = ::fork();
@@ -202,7 +274,9 @@ template<class Test> int withoutRights(const Test& test) {
 TEST_F(FirewallTest, WithoutTheRightsTheErrorSaysSo) {
     std::filesystem::permissions(root_, std::filesystem::perms::all);
     std::filesystem::create_directories(statePath("/run/velt"));
-    std::filesystem::permissions(statePath("/run/velt"), std::filesystem::perms::all);
+    for (const char* place : {"/run/velt", "/var/lib/velt/lock"}) {
+        std::filesystem::permissions(statePath(place), std::filesystem::perms::all);
+    }
     EXPECT_EQ(withoutRights([] {
                   const bool refused = VELTFwRuleHup() < 0;
                   return refused && lastErrorSentence() ==

@@ -7,7 +7,6 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/ports/port_conflict.h"
 #include "standalone/services/services.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/services/plan_double.h"
@@ -52,7 +51,7 @@ protected:
 
     static void expectNoConflict(const char* service, int first, int last) {
         EXPECT_EQ(IsPortConflict(service, first, last), 0) << lastErrorSentence();
-        EXPECT_EQ(lastPortHolder(), "");
+        EXPECT_EQ(lastPortConflict().holder, "");
         EXPECT_EQ(lastPortConflict().port, 0);
     }
 
@@ -60,7 +59,7 @@ protected:
                                const std::string& holder) {
         EXPECT_NE(IsPortConflict(service, first, last), 0) << service << " " << first << ":" << last;
         EXPECT_EQ(lastPortConflict().port, port);
-        EXPECT_EQ(lastPortHolder(), holder);
+        EXPECT_EQ(lastPortConflict().holder, holder);
         EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) + " is taken by " + holder + ".");
     }
 
@@ -76,7 +75,7 @@ TEST_F(PortConflictTest, PortsOutsideTheirRangeConflict) {
     for (const char* service : {"ftp", "ssh"}) {
         for (const int port : {0, -1, 65536, INT_MAX, INT_MIN}) {
             EXPECT_NE(IsPortConflict(service, port, port), 0) << port;
-            EXPECT_EQ(lastPortHolder(), "");
+            EXPECT_EQ(lastPortConflict().holder, "");
             EXPECT_EQ(lastErrorSentence(),
                       "The port " + std::to_string(port) + " is not one from 1 to 65535.");
         }
@@ -162,6 +161,16 @@ TEST_F(PortConflictTest, WhoeverListensIsNamed) {
     expectConflict("ftp", port - 1, port + 1, port, thisProcess());
 }
 
+TEST_F(PortConflictTest, AStrangerOnTheStoredPortConflicts) {
+    const Listener onFtp(ftpPort_);
+    const Listener onSftp(sftpPort_);
+    expectConflict("ftp", ftpPort_, ftpPort_, ftpPort_, thisProcess());
+    expectConflict("ssh", sftpPort_, sftpPort_, sftpPort_, thisProcess());
+    const Listener onPassive(45003);
+    storeFtp(45000, 45010);
+    expectNoConflict("ftp", 45000, 45010);
+}
+
 TEST_F(PortConflictTest, TheDaemonAndItsSessionsAreNotInTheirOwnWay) {
     storeFtp(0, 0, VELT_FTP_SERVICE_PLAIN);
     const int second = freePort();
@@ -169,6 +178,7 @@ TEST_F(PortConflictTest, TheDaemonAndItsSessionsAreNotInTheirOwnWay) {
     ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     ASSERT_TRUE(waitUntil([&] { return accepts(second); }, std::chrono::seconds(1)));
     expectNoConflict("ftp", second, second);
+    expectNoConflict("ftp", ftpPort_, ftpPort_);
     expectConflict("ssh", second, second, second,
                    "velt-test-daemo (process " + std::to_string(serviceState("ftpd").daemon.pid) + ")");
 }
@@ -176,10 +186,10 @@ TEST_F(PortConflictTest, TheDaemonAndItsSessionsAreNotInTheirOwnWay) {
 TEST_F(PortConflictTest, EachThreadRemembersItsOwnAnswer) {
     EXPECT_NE(IsPortConflict("ftp", sftpPort_, sftpPort_), 0);
     std::thread([] {
-        EXPECT_EQ(lastPortHolder(), "");
+        EXPECT_EQ(lastPortConflict().holder, "");
         expectConflict("ftp", 443, 443, 443, "the service https of this server");
     }).join();
-    EXPECT_EQ(lastPortHolder(), "the SFTP service");
+    EXPECT_EQ(lastPortConflict().holder, "the SFTP service");
     expectNoConflict("ftp", 46000, 46000);
 }
 

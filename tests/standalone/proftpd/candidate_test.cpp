@@ -2,6 +2,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/daemon_test.h"
 #include "standalone/settings/candidate.h"
+#include "standalone/supervise/last_words.h"
 #include "tests/standalone/proftpd/example.h"
 #include "tests/standalone/support/temporary_folder.h"
 
@@ -69,6 +70,12 @@ TEST(LastWords, areWhatExplainsTheFailure) {
                         "2026-01-31 12:00:00,123 host proftpd[42] host: mod_x: two.\n\n"),
               "mod_x: two");
     EXPECT_EQ(lastWords("/x line 1: Bad option\r\n"), "/x line 1: Bad option");
+    EXPECT_EQ(lastWords("2026-01-31 12:00:00,123 host proftpd[42] ::: Failed binding to ::, port 21: in use\n"
+                        "2026-01-31 12:00:00,123 host proftpd[42] ::: Check to see if inetd is running.\n"),
+              "Failed binding to ::, port 21: in use");
+    EXPECT_EQ(lastWords("Bind to port 22 on 0.0.0.0 failed: Address already in use.\r\n"
+                        "Cannot bind any address.\r\n"),
+              "Bind to port 22 on 0.0.0.0 failed: Address already in use");
     EXPECT_EQ(lastWords(""), "");
 }
 

@@ -15,10 +15,13 @@ PlanDouble& planDouble() {
 
 namespace {
 
+int refuseIfAsked() {
+    return planDouble().refuse ? fail(ErrorNumber::daemon, "The configuration was refused.") : 0;
+}
+
 std::optional<DaemonPlan> makePlan(int port, const std::string& settings,
                                    const std::vector<std::string>& options) {
-    if (planDouble().refuse) {
-        fail(ErrorNumber::daemon, "The configuration was refused.");
+    if (refuseIfAsked() < 0) {
         return std::nullopt;
     }
     std::string hash = settings;
@@ -53,11 +56,11 @@ std::optional<DaemonPlan> planSftpDaemon() {
 }
 
 int testFtpCandidate(const FtpSettings&) {
-    return 0;
+    return test::refuseIfAsked();
 }
 
 int testSftpCandidate(const SftpSettings&) {
-    return 0;
+    return test::refuseIfAsked();
 }
 
 } // namespace velt

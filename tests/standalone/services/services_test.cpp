@@ -196,8 +196,12 @@ TEST_F(ServicesTest, AStartOnATakenPortNamesTheHolder) {
 TEST_F(ServicesTest, TheDaemonsOwnWordsReachTheCaller) {
     planDouble().ftpOptions = {"--refuse", "fatal: no such certificate"};
     EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
-    EXPECT_EQ(lastErrorSentence(),
-              "The FTP daemon does not start: it ended with status 1: fatal: no such certificate.");
+    EXPECT_EQ(lastErrorSentence(), "The FTP daemon does not start: fatal: no such certificate.");
+    planDouble().ftpOptions = {"--refuse",
+                               "2026-11-21 07:19:56,458 vm proftpd[19] ::: Failed binding to port 21\n"
+                               "2026-11-21 07:19:56,458 vm proftpd[19] ::: Check inetd"};
+    EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
+    EXPECT_EQ(lastErrorSentence(), "The FTP daemon does not start: Failed binding to port 21.");
 }
 
 TEST_F(ServicesTest, ARefusedConfigurationLeavesTheDaemonAlone) {
@@ -207,6 +211,10 @@ TEST_F(ServicesTest, ARefusedConfigurationLeavesTheDaemonAlone) {
     EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
     EXPECT_EQ(lastErrorSentence(), "The configuration was refused.");
     EXPECT_EQ(daemonOf("ftpd"), daemon);
+    clearLastError();
+    EXPECT_LT(VLIBServicectlStop("ftpd", 0), 0) << "the first half of a restart";
+    EXPECT_EQ(lastErrorSentence(), "The configuration was refused.");
+    EXPECT_TRUE(accepts(ftpPort_));
 }
 
 TEST_F(ServicesTest, DamagedSettingsStartNothing) {

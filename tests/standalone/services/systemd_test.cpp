@@ -152,10 +152,19 @@ protected:
     }
 };
 
-TEST_F(FailingSystemdTest, AFailedStartGivesTheLastLinesOfTheJournal) {
+TEST_F(FailingSystemdTest, AFailedStartGivesTheLastWordsOfTheJournal) {
     SystemdBackend backend("ftpd", places_);
     EXPECT_LT(backend.start(testPlan(port_, "one")), 0);
-    EXPECT_EQ(lastErrorSentence(), "The FTP daemon does not start: first | last words.");
+    EXPECT_EQ(lastErrorSentence(), "The FTP daemon does not start: last words.");
+}
+
+TEST_F(SystemdTest, ASlowRestartLeavesLessTimeForTheDaemon) {
+    writeScript(places_.systemctl,
+                "case \"$1 $3\" in \"restart \") sleep 3 ;; *ActiveState) echo inactive ;; esac\n");
+    SystemdBackend backend("ftpd", places_);
+    const auto began = std::chrono::steady_clock::now();
+    EXPECT_LT(backend.start(testPlan(port_, "one")), 0);
+    EXPECT_LT(std::chrono::steady_clock::now() - began, std::chrono::milliseconds(6500));
 }
 
 TEST_F(SystemdTest, WhatWasNeverStartedIsStoppedWithoutACall) {

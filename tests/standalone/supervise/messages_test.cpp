@@ -62,11 +62,23 @@ TEST_F(StateFile, IsNotMadeOfAnotherText) {
     EXPECT_FALSE(readServiceState(file_));
     std::ofstream(file_) << "state running\n";
     EXPECT_FALSE(readServiceState(file_));
-    std::ofstream(file_) << "velt-supervise 1\nstate dancing\ndaemon x y\nport\n";
+    std::ofstream(file_) << "velt-supervise 2\nboot " << bootId() << "\nstate dancing\ndaemon x y\nport\n";
     const auto read = readServiceState(file_);
     ASSERT_TRUE(read);
     EXPECT_EQ(read->state, RunState::stopped);
     EXPECT_FALSE(read->daemon);
+}
+
+TEST_F(StateFile, OfAnotherBootIsNone) {
+    const auto self = identifyProcess(::getpid());
+    ASSERT_TRUE(self);
+    ASSERT_FALSE(bootId().empty());
+    for (const std::string& boot : {"boot " + bootId() + "\n", "boot 0" + bootId() + "\n", std::string()}) {
+        std::ofstream(file_) << "velt-supervise 2\n"
+                             << boot << "state running\ndaemon " << self->pid << ' ' << self->startTime
+                             << '\n';
+        EXPECT_EQ(readServiceState(file_).has_value(), boot == "boot " + bootId() + "\n") << boot;
+    }
 }
 
 TEST(Processes, AreToldApartByTheirStart) {

@@ -10,6 +10,8 @@
 #include <unistd.h>
 
 #include <csignal>
+#include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <thread>
 
@@ -66,6 +68,13 @@ TEST_F(SupervisorTest, ADaemonThatRefusesToStartSaysWhy) {
     EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, seconds(1)));
 }
 
+TEST_F(SupervisorTest, ALineThatWasCutShowsIt) {
+    EXPECT_LT(backend_.start(testPlan(port_, "one", {"--refuse", "why: " + std::string(1000, 'x') + " end"})),
+              0);
+    EXPECT_NE(backend_.state().reason.find("xxx…"), std::string::npos) << backend_.state().reason;
+    EXPECT_EQ(backend_.state().reason.find("end"), std::string::npos) << backend_.state().reason;
+}
+
 TEST_F(SupervisorTest, ADaemonThatNeverListensFailsWithinFiveSeconds) {
     const auto began = Clock::now();
     EXPECT_LT(backend_.start(testPlan(port_, "one", {"--delay", "60000"})), 0);
@@ -79,6 +88,23 @@ TEST_F(SupervisorTest, AProgramThatIsNotThereIsNamed) {
     plan.arguments[0] = "/nowhere/daemon";
     EXPECT_LT(backend_.start(plan), 0);
     EXPECT_NE(lastErrorSentence().find("/nowhere/daemon"), std::string::npos) << lastErrorSentence();
+}
+
+TEST_F(SupervisorTest, ASupervisorThatDoesNotReportIsToldFromOneThatEnded) {
+    const std::string built = std::getenv("VELT_LIBEXEC_DIR");
+    const auto useScript = [this](const std::string& line) {
+        const auto program = root_ / "velt-supervise";
+        std::ofstream(program) << "#!/bin/sh\n" << line << '\n';
+        std::filesystem::permissions(program, std::filesystem::perms::owner_all);
+        ::setenv("VELT_LIBEXEC_DIR", root_.c_str(), 1);
+    };
+    useScript("exit 0");
+    EXPECT_LT(backend_.start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: its supervisor ended without a reason.");
+    useScript("sleep 5.5 &");
+    EXPECT_LT(backend_.start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: its supervisor does not report in time.");
+    ::setenv("VELT_LIBEXEC_DIR", built.c_str(), 1);
 }
 
 TEST_F(SupervisorTest, ASecondStartWithTheSameConfigurationDoesNothing) {

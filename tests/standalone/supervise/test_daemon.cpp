@@ -1,8 +1,8 @@
 // A daemon that behaves as its arguments say: what the supervisor is tried on.
 //
-//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--live MS] [--stubborn]
+//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--live MS] [--stubborn] [--any]
 //
-// It listens on loopback; each connection is served by a session in a process and a terminal session of its own, which answers
+// It listens on loopback, with --any on all addresses; each connection is served by a session in a process and a terminal session of its own, which answers
 // every byte with the same byte and ends with its connection, or with a SIGTERM.
 
 #include <arpa/inet.h>
@@ -26,6 +26,7 @@ struct Options {
     int live = 0;
     const char* words = nullptr;
     bool stubborn = false;
+    bool any = false;
 };
 
 Options parse(int argc, char** argv) {
@@ -34,6 +35,10 @@ Options parse(int argc, char** argv) {
         const std::string_view name = argv[index];
         if (name == "--stubborn") {
             options.stubborn = true;
+            continue;
+        }
+        if (name == "--any") {
+            options.any = true;
             continue;
         }
         const char* value = index + 1 < argc ? argv[++index] : "";
@@ -50,13 +55,13 @@ Options parse(int argc, char** argv) {
     return options;
 }
 
-int listenOn(int port) {
+int listenOn(int port, bool any) {
     const int descriptor = ::socket(AF_INET, SOCK_STREAM, 0);
     const int on = 1;
     ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
     sockaddr_in address{};
     address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    address.sin_addr.s_addr = htonl(any ? INADDR_ANY : INADDR_LOOPBACK);
     address.sin_port = htons(static_cast<in_port_t>(port));
     if (::bind(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 ||
         ::listen(descriptor, 16) != 0) {
@@ -90,7 +95,7 @@ int main(int argc, char** argv) {
     std::this_thread::sleep_for(std::chrono::milliseconds(options.delay));
     std::vector<int> listeners;
     for (const int port : options.ports) {
-        listeners.push_back(listenOn(port));
+        listeners.push_back(listenOn(port, options.any));
     }
     if (options.live > 0) {
         std::thread([live = options.live] {

@@ -91,14 +91,15 @@ struct State {
     /// Stored rule lines, "user:<uid>:<path>" or "group:<gid>:<path>". A line of another form, or with
     /// an id that `users` or `groups` does not have, is not parsed.
     std::vector<std::string> rules;
+    int userFlag = 1; ///< what the parser of a rule gives for a user
 
     /// Ports by the service that holds them. A conflict is a port of the range that a service other
     /// than the asking one holds.
     std::map<std::string, std::set<int>> takenPorts;
 
     bool journalListGets = false; ///< VLIBCSzListGet
-    /// VLIBCErrGet, VLIBCErrorGetFile, VLIBCErrorGetLine. Off by default also because compilers differ
-    /// in the order in which they evaluate the three as arguments of one call.
+    /// VLIBCErrGet, VLIBCErrorGetFile, VLIBCErrorGetLine. Off by default: the log line that asks for them
+    /// shows what they gave.
     bool journalErrorGets = false;
 
     bool enumeratorsReplaceList = false;       ///< a new list stands where the old one stood

@@ -64,7 +64,7 @@ int VELTFTPChrootRuleParseToName(const char* line, int* isUser, char* name, int 
     if (!account || copyWhole(name, nameSize, *account) < 0 || copyWhole(path, pathSize, parts[3]) < 0) {
         return -1;
     }
-    *isUser = user ? 1 : 0;
+    *isUser = user ? Platform::instance().userFlag : 0;
     return 0;
 }
 
