@@ -245,6 +245,33 @@ TEST_F(FakePlatform, NarrowsAndMovesChrootUsers) {
     EXPECT_EQ(platform.journal[1], R"(VELTFTPNonChrootUserEnum(list1, 1, "bob", null))");
 }
 
+TEST_F(FakePlatform, NarrowsByTheSourceAndDomainOfTheUsersItKnows) {
+    platform.users = {{"ann", {"", 1000, fake::sourceLocal, ""}}, {"LAB\\eve", {"", 1001, 2, "LAB"}}};
+    platform.chrootUsers = {"ann", "bob", "LAB\\eve"};
+    VLIBCSzList* list = VLIBCSzListAlloc(8);
+    ASSERT_EQ(VELTFTPChrootUserEnum(&list, 2, nullptr, nullptr), 0);
+    EXPECT_EQ(textsOf(list), (Lines{"bob", "LAB\\eve"}));
+    ASSERT_EQ(VELTFTPChrootUserEnum(&list, fake::everySource, nullptr, "LAB"), 0);
+    EXPECT_EQ(textsOf(list), (Lines{"bob", "LAB\\eve"}));
+    ASSERT_EQ(VELTFTPChrootUserEnum(&list, 1, nullptr, nullptr), 0);
+    EXPECT_EQ(textsOf(list), (Lines{"ann", "bob"}));
+    VLIBCSzListFree(list);
+}
+
+TEST_F(FakePlatform, SetsTheLastErrorOfALookUpUnlessTheTestDid) {
+    VELT_SHARE* share = nullptr;
+    EXPECT_LT(VELTShareGet("nowhere", &share), 0);
+    EXPECT_NE(VLIBCErrGet(), 0);
+    platform.lastError = {0x2A, "share.c", 7};
+    EXPECT_LT(VELTShareGet("nowhere", &share), 0);
+    EXPECT_EQ(VLIBCErrGet(), 0x2A);
+    EXPECT_STREQ(VLIBCErrorGetFile(), "share.c");
+    platform.lastError = {};
+    platform.fail("VELTShareGet", 3);
+    EXPECT_LT(VELTShareGet("nowhere", &share), 0);
+    EXPECT_EQ(VLIBCErrGet(), 0) << "what a test makes fail has the error that the test sets";
+}
+
 TEST_F(FakePlatform, FindsPortsThatOthersHold) {
     platform.takenPorts = {{"http", {80, 8080}}, {"ftp", {21}}};
     EXPECT_EQ(WebUtils::IsPortConflict("ftp", 21, 21), 0);
