@@ -12,7 +12,7 @@ namespace velt::host {
 
 namespace {
 
-constexpr int maxLimit = 1000;
+constexpr int maxLimit = 500;
 
 std::optional<unsigned> hexDigits(std::string_view text) {
     unsigned value = 0;

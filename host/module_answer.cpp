@@ -15,18 +15,19 @@ struct Meaning {
     int status;
     const char* title;
     bool beforeAnyChange; ///< the module refuses with it before it touches anything
+    bool portTaken;
 };
 
 constexpr int badParameter = 1901;
-constexpr Meaning otherFailure{0, 500, "The operation failed", false};
+constexpr Meaning otherFailure{0, 500, "The operation failed", false, false};
 
 constexpr std::array<Meaning, 6> meanings{{
-    {badParameter, 422, "A parameter is not acceptable", true},
-    {1902, 500, "The operation failed", false},
-    {1903, 409, "The FTP port is taken", true},
-    {1904, 409, "The passive port range is taken", true},
-    {1905, 409, "The share cannot be reached over FTP", true},
-    {1951, 409, "The SFTP port is taken", true},
+    {badParameter, 422, "A parameter is not acceptable", true, false},
+    {1902, 500, "The operation failed", false, false},
+    {1903, 409, "The FTP port is taken", true, true},
+    {1904, 409, "The passive port range is taken", true, true},
+    {1905, 409, "The share cannot be reached over FTP", true, false},
+    {1951, 409, "The SFTP port is taken", true, true},
 }};
 
 const Meaning& meaningOf(int code) {
@@ -55,7 +56,7 @@ std::string detailOf(const Outcome& outcome, const Meaning& meaning, const std::
     for (const FieldError& error : errors) {
         append(detail, sentenceOf(error));
     }
-    if (meaning.status == 409 && !outcome.platform.holder.empty()) {
+    if (meaning.portTaken && !outcome.platform.holder.empty()) {
         append(detail, "Port " + std::to_string(outcome.platform.port) + " is held by " +
                            outcome.platform.holder + ".");
     } else if (meaning.status == 500) {
@@ -80,7 +81,7 @@ HttpResponse refused(const Outcome& outcome, const std::vector<FieldError>& erro
         entry["expected"] = error.expected;
         members["errors"].append(entry);
     }
-    if (meaning.status == 409 && !outcome.platform.holder.empty()) {
+    if (meaning.portTaken && !outcome.platform.holder.empty()) {
         members["holder"] = outcome.platform.holder;
     }
     return problemWith(meaning.status, std::move(members), requestId);

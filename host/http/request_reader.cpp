@@ -115,7 +115,7 @@ RequestReader::Step RequestReader::checkHead() {
     begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
     headDone_ = true;
     const bool tooLarge = error == http::error::body_limit;
-    if (error && error != http::error::need_more && !tooLarge) {
+    if (error && error != http::error::need_more && !tooLarge && !parser.is_header_done()) {
         return error == http::error::bad_version ? refuse(505, "Only HTTP/1.0 and HTTP/1.1 are spoken.")
                                                  : refuse(400, "The request is no well-formed HTTP.");
     }
@@ -132,8 +132,11 @@ RequestReader::Step RequestReader::checkHead() {
     if (!request_.target.starts_with('/')) {
         return refuse(400, "The request's target must begin with \"/\".");
     }
+    // What is wrong with the body is told later: access is looked at first.
+    if (error && error != http::error::need_more) {
+        refusal_ = {400, "The body is no well-formed HTTP."};
+    }
     if (tooLarge) {
-        // Access is looked at first: who has none does not learn more.
         refusal_ = {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
     }
     return Step::head;

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <mutex>
 
 namespace {
 
@@ -17,6 +18,8 @@ bool changesSomething(const std::string& operation) {
     return std::find(changing.begin(), changing.end(), operation) != changing.end();
 }
 
+/// Modules of the tests' own are called on several threads; those that call the fake platform are not.
+std::mutex mutex;
 thread_local std::size_t journalStart = 0;
 
 void tellObserver(const std::string& operation) {
@@ -61,12 +64,14 @@ void unobservePlatform() {
 }
 
 void beginPlatformRequest(const std::string& actor, const std::string& address) {
+    const std::lock_guard lock(mutex);
     FakeAccess::instance().actor = actor;
     FakeAccess::instance().address = address;
     journalStart = fake::Platform::instance().journal.size();
 }
 
 PlatformReport endPlatformRequest() {
+    const std::lock_guard lock(mutex);
     FakeAccess& access = FakeAccess::instance();
     PlatformReport report;
     const auto& journal = fake::Platform::instance().journal;

@@ -114,6 +114,7 @@ TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
 }
 
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {
+    access.holder = "what an earlier request of the thread found";
     const Answer answer = post(security + "set", R"({"anonymous_chroot":true,"anonymous_chroot_share":"x"})");
     EXPECT_EQ(answer.status, 409);
     EXPECT_EQ(answer.json()["code"], 1905);
