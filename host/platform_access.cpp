@@ -46,14 +46,10 @@ EffectDecision seeEffect(Effect effect, std::string_view subject) {
 
 AdminLogEntry toEntry(const LogEntry& entry) {
     const auto time = entry.time.time_since_epoch();
-    return {entry.id,
-            std::chrono::duration_cast<std::chrono::milliseconds>(time).count(),
-            entry.category,
-            entry.level,
-            entry.event,
-            entry.texts,
-            entry.sentence,
-            entry.actor,
+    return {entry.id,       std::chrono::duration_cast<std::chrono::milliseconds>(time).count(),
+            entry.category, entry.level,
+            entry.event,    entry.texts,
+            entry.sentence, entry.actor,
             entry.address};
 }
 
@@ -118,7 +114,8 @@ PlatformReport endPlatformRequest() {
 std::optional<std::vector<AdminLogEntry>> queryAdminLog(const AdminLogQuery& query, std::string& error) {
     LogFilter filter;
     if (query.sinceMilliseconds) {
-        filter.since = std::chrono::system_clock::time_point(std::chrono::milliseconds(*query.sinceMilliseconds));
+        filter.since =
+            std::chrono::system_clock::time_point(std::chrono::milliseconds(*query.sinceMilliseconds));
     }
     filter.event = query.event;
     filter.actor = query.actor;

@@ -20,7 +20,7 @@ void Connection::enter(State state, std::chrono::milliseconds time) {
     deadline_ = nowInMilliseconds() + time.count();
     // A connection that stopped being used while the host was ending the unused ones.
     if (ending_ && state == State::idle) {
-        shutdown(descriptor(), SHUT_RDWR);
+        shutdown(descriptor(), SHUT_RD);
     }
 }
 
@@ -34,9 +34,10 @@ void Connection::enforceDeadline() {
         return;
     }
     const State state = state_;
-    if (state == State::head || state == State::body) {
-        tooSlow_ = true;
-        // The reader wakes up and answers; the deadline of its writing is the next.
+    if (state == State::idle || state == State::head || state == State::body) {
+        tooSlow_ = state != State::idle;
+        // The reader wakes up, and answers if it has to; the deadline of its writing is the next. A request that was
+        // complete a moment ago is still answered.
         deadline_ = never;
         shutdown(descriptor(), SHUT_RD);
     } else {
@@ -47,7 +48,9 @@ void Connection::enforceDeadline() {
 void Connection::endWhenUnused() {
     ending_ = true;
     const State state = state_;
-    if (state == State::idle || state == State::events) {
+    if (state == State::idle || state == State::head) {
+        shutdown(descriptor(), SHUT_RD);
+    } else if (state == State::events) {
         shutdown(descriptor(), SHUT_RDWR);
     }
 }

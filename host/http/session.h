@@ -94,7 +94,7 @@ private:
 
     void onRead(const Error& error, std::size_t bytes) {
         if (error) {
-            if (tooSlow()) {
+            if (tooSlow() && state() != State::idle) {
                 respond(handler_.failure(408, "The request took too long to arrive."), false);
             }
             return;

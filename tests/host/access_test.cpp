@@ -17,10 +17,20 @@
 namespace {
 
 const std::string sftp = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
-const std::vector<std::string> everyPath{
-    "/",        "/api",    "/api/status",  "/api/log", "/api/tokens", "/api/tokens/1",
-    "/healthz", "/metrics", "/openapi.json", "/events",  sftp + "get",  sftp + "set",
-    "/nowhere", "/api/VELT.None/v1/get"};
+const std::vector<std::string> everyPath{"/",
+                                         "/api",
+                                         "/api/status",
+                                         "/api/log",
+                                         "/api/tokens",
+                                         "/api/tokens/1",
+                                         "/healthz",
+                                         "/metrics",
+                                         "/openapi.json",
+                                         "/events",
+                                         sftp + "get",
+                                         sftp + "set",
+                                         "/nowhere",
+                                         "/api/VELT.None/v1/get"};
 
 class HostAccess : public HostTest {
 protected:
@@ -64,7 +74,8 @@ TEST_F(HostAccess, WithoutATokenNothingGoesFurtherThan401) {
 TEST_F(HostAccess, ABodyTooLargeWithoutATokenIs401) {
     start();
     Client client = connect();
-    EXPECT_EQ(client.ask("POST /api HTTP/1.1\r\nHost: localhost\r\nContent-Length: 99999999\r\n\r\n").status, 401);
+    EXPECT_EQ(client.ask("POST /api HTTP/1.1\r\nHost: localhost\r\nContent-Length: 99999999\r\n\r\n").status,
+              401);
 }
 
 TEST_F(HostAccess, WrongTokensAreRefusedAndLogged) {
@@ -89,8 +100,9 @@ TEST_F(HostAccess, AWrongTokenWaitsForItsAnswer) {
 
 TEST_F(HostAccess, ViewersRead) {
     start();
-    for (const std::string& path : {sftp + "get", std::string("/api"), std::string("/api/status"),
-                                    std::string("/api/log"), std::string("/metrics"), std::string("/healthz")}) {
+    for (const std::string& path :
+         {sftp + "get", std::string("/api"), std::string("/api/status"), std::string("/api/log"),
+          std::string("/metrics"), std::string("/healthz")}) {
         EXPECT_EQ(ask("GET", path, viewer).status, 200) << path;
     }
     const std::string list = "/api/VELT.Core.FileServ.FTP.ChrootUser/v1/list";
@@ -121,8 +133,8 @@ TEST_F(HostAccess, TheHostMustBeThisOne) {
     }
     for (const std::string& host :
          {std::string("evil.example"), "evil.example" + real, std::string("localhost:1"),
-          std::string("localhost.evil.example"), std::string("127.0.0.1.evil.example"), std::string("10.0.0.1"),
-          std::string("[::1"), std::string("")}) {
+          std::string("localhost.evil.example"), std::string("127.0.0.1.evil.example"),
+          std::string("10.0.0.1"), std::string("[::1"), std::string("")}) {
         EXPECT_EQ(askFor(host), 403) << host;
     }
 }

@@ -104,8 +104,8 @@ TEST_F(HostEndpoints, TheLogIsFiltered) {
 
 TEST_F(HostEndpoints, AFilterThatIsNoneIsRefused) {
     start();
-    for (const char* query : {"?limit=0", "?limit=501", "?limit=x", "?before=-1", "?event=0xZZ", "?since=yesterday",
-                              "?actor=%zz", "?actor=%", "?actor=%ff", "?unknown=1"}) {
+    for (const char* query : {"?limit=0", "?limit=501", "?limit=x", "?before=-1", "?event=0xZZ",
+                              "?since=yesterday", "?actor=%zz", "?actor=%", "?actor=%ff", "?unknown=1"}) {
         EXPECT_EQ(get(std::string("/api/log") + query).status, 400) << query;
     }
 }
@@ -133,7 +133,8 @@ TEST_F(HostEndpoints, AServiceActionIsAnEvent) {
     start();
     Client events = listen();
     access.observer.serviceAction("ftpd-pure", "stop");
-    EXPECT_EQ(events.readUntil("\n\n"), "event: service\ndata: {\"action\":\"stop\",\"service\":\"ftpd-pure\"}\n\n");
+    EXPECT_EQ(events.readUntil("\n\n"),
+              "event: service\ndata: {\"action\":\"stop\",\"service\":\"ftpd-pure\"}\n\n");
 }
 
 TEST_F(HostEndpoints, WhatChangesNothingIsNoEvent) {

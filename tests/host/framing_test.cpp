@@ -85,8 +85,9 @@ TEST_F(HostFraming, UnknownTransferCodingsAreNotImplemented) {
 
 TEST_F(HostFraming, ExactlyOneHostIsNeeded) {
     EXPECT_EQ(refused("GET /healthz HTTP/1.1\r\n" + admin + "\r\n").status, 400);
-    EXPECT_EQ(refused("GET /healthz HTTP/1.1\r\nHost: localhost\r\nHost: localhost\r\n" + admin + "\r\n").status,
-              400);
+    EXPECT_EQ(
+        refused("GET /healthz HTTP/1.1\r\nHost: localhost\r\nHost: localhost\r\n" + admin + "\r\n").status,
+        400);
 }
 
 TEST_F(HostFraming, ContinuedLinesAreRefused) {
@@ -115,7 +116,9 @@ TEST_F(HostFraming, MalformedHeadsAreRefused) {
              "GET /healthz HTTP/1.1\r\nContent-Length: 1\r\nContent-Length: 2\r\n" + host + "\r\n",
              "POST /api HTTP/1.1\r\nContent-Length: 2\r\nTransfer-Encoding: chunked\r\n" + host + "\r\n{}",
              "GET http://localhost/healthz HTTP/1.1\r\n" + host + "\r\n",
-             "GET /a\x01" "b HTTP/1.1\r\n" + host + "\r\n",
+             "GET /a\x01"
+             "b HTTP/1.1\r\n" +
+                 host + "\r\n",
          }) {
         EXPECT_EQ(refused(text).status, 400) << text;
     }
@@ -136,8 +139,9 @@ TEST_F(HostFraming, AClientMayWaitForContinue) {
 }
 
 TEST_F(HostFraming, AClientWithoutAccessIsNotToldToContinue) {
-    EXPECT_EQ(refused("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n"
-                                         "Content-Length: 15\r\nExpect: 100-continue\r\n\r\n")
+    EXPECT_EQ(refused("POST " + target +
+                      "set HTTP/1.1\r\nHost: localhost\r\n"
+                      "Content-Length: 15\r\nExpect: 100-continue\r\n\r\n")
                   .status,
               401);
 }
@@ -152,7 +156,8 @@ TEST_F(HostFraming, HeadIsAnsweredWithoutABody) {
 TEST_F(HostFraming, AClientThatLeavesEarlyHarmsNobody) {
     for (int i = 0; i < 50; ++i) {
         Client client = connect();
-        client.send(requestText("POST", target + "set", admin, R"({"enable":true})").substr(0, 40U + static_cast<unsigned>(i)));
+        client.send(requestText("POST", target + "set", admin, R"({"enable":true})")
+                        .substr(0, 40U + static_cast<unsigned>(i)));
     }
     for (int i = 0; i < 50; ++i) {
         Client client = connect();
