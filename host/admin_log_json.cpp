@@ -116,7 +116,8 @@ std::optional<AdminLogQuery> parseLogQuery(const std::string& query, std::string
         // An empty filter does not narrow.
         const std::string expected = value->empty() && !key.empty() ? "" : takeFilter(key, *value, parsed);
         if (!expected.empty()) {
-            error = key + ": expected " + expected;
+            error = key;
+            error += ": expected " + expected;
             return std::nullopt;
         }
     }

@@ -75,8 +75,9 @@ void ModuleTable::addRows(const VELT::APITableRow* table, const std::string& fil
         const auto [place, added] =
             rows_.try_emplace(Key{row->api, row->version, row->method}, std::move(entry));
         if (!added) {
-            throw LoadError("The row " + name + " is served twice: by " + place->second.file + " and by " +
-                            file + ".");
+            std::string files = "by " + place->second.file;
+            files += " and by " + file;
+            throw LoadError("The row " + name + " is served twice: " + files + ".");
         }
     }
 }

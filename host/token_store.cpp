@@ -148,7 +148,7 @@ void TokenStore::store(const std::vector<Token>& tokens) const {
 }
 
 std::string TokenStore::create(const std::string& name, Role role, Token& created) {
-    const std::string token = "velt_" + randomHexadecimal(tokenBytes);
+    std::string token = "velt_" + randomHexadecimal(tokenBytes);
     created = {randomHexadecimal(idBytes), name, role, timestamp(), hashOf(token)};
     const std::lock_guard lock(mutex_);
     std::vector<Token> changed = tokens_;

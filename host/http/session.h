@@ -150,12 +150,12 @@ private:
     void refuseAccess(Refusal refusal) {
         enterWithoutDeadline(State::working);
         if (!refusal.delayed) {
-            respond(std::move(refusal.response), false);
+            respond(refusal.response, false);
             return;
         }
         timer_.expires_after(limits_.refusalDelay);
         timer_.async_wait([self = this->shared_from_this(), response = std::move(refusal.response)](
-                              const Error&) mutable { self->respond(std::move(response), false); });
+                              const Error&) mutable { self->respond(response, false); });
     }
 
     void serve() {
@@ -169,13 +169,13 @@ private:
         handler_.handle(std::move(request), principal_,
                         [self = this->shared_from_this()](HttpResponse response) {
                             auto& context = self->context_;
-                            boost::asio::post(context, [self, answer = std::move(response)]() mutable {
-                                self->respond(std::move(answer), self->reader_.keepAlive());
+                            boost::asio::post(context, [self, answer = std::move(response)] {
+                                self->respond(answer, self->reader_.keepAlive());
                             });
                         });
     }
 
-    void respond(HttpResponse response, bool keepAlive) {
+    void respond(const HttpResponse& response, bool keepAlive) {
         keepAlive = keepAlive && !ending();
         enter(State::writing, limits_.writeTime);
         output_ = responseText(response, keepAlive, withBody_);
