@@ -75,9 +75,9 @@ void ModuleTable::addRows(const VELT::APITableRow* table, const std::string& fil
         const auto [place, added] =
             rows_.try_emplace(Key{row->api, row->version, row->method}, std::move(entry));
         if (!added) {
-            std::string files = "by " + place->second.file;
-            files += " and by " + file;
-            throw LoadError("The row " + name + " is served twice: " + files + ".");
+            std::string reason = "The row " + name + " is served twice: by ";
+            reason.append(place->second.file).append(" and by ").append(file).append(".");
+            throw LoadError(reason);
         }
     }
 }
