@@ -24,8 +24,8 @@ bool isDirectory(const std::string& path) {
     return stat64(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
 }
 
-/// Whether the directory of a rule ("/share" or "/share/below") exists now. An empty path is out of range for the split
-/// and leaves as std::out_of_range.
+/// Whether the directory of a rule ("/share" or "/share/below") exists now. An empty path is out of range for
+/// the split and leaves as std::out_of_range.
 bool pathExists(const std::string& path) {
     if (path == homePath) {
         return true;

@@ -19,8 +19,9 @@ public:
     /// Fills "total" and "rules" of `result`. Stored lines that cannot be read are left out.
     bool LoadRule(Json::Value& result);
 
-    /// Stores "rules" in place of all stored rules. Rules of unknown users and groups are left out; without an array of
-    /// rules the stored set becomes empty.
+    /// Stores "rules" in place of all stored rules. Rules of unknown users and groups are left out. Rules
+    /// that are absent, null, a text, a number or a bool store an empty set; an object with members, or an
+    /// element that is no object, passes the JSON library's exception, and nothing is stored.
     bool SaveRule(const Json::Value& params);
 };
 

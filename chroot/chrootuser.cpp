@@ -98,8 +98,8 @@ void pushIds(const Json::Value& ids, SzList& list) {
     }
 }
 
-void addEntry(unsigned event, const char* name) {
-    VELTLogSet1(logCategory, logLevel, event, name, "", "", "");
+void addEntry(unsigned event, const char* arg1) {
+    VELTLogSet1(logCategory, logLevel, event, arg1, "", "", "");
 }
 
 } // namespace
@@ -188,8 +188,9 @@ bool FTPChrootUserServiceHandler::AddUser(const Json::Value& params, Json::Value
     }
     Json::Value added(Json::arrayValue);
     for (int i = 0; i < list.count(); ++i) {
-        addEntry(eventUserAdded, list.at(i));
-        added.append(list.at(i));
+        const char* const name = list.at(i);
+        addEntry(eventUserAdded, name);
+        added.append(name);
     }
     result["chrootuser_id"] = added;
     return true;

@@ -19,13 +19,15 @@ public:
     /// Takes the chroot status from users.
     void Delete();
 
-    /// Fills "total" (before paging) and "user" of `result`.
+    /// Fills "total" (before paging) and "user" of `result`. An offset outside the list stands for 0, a limit
+    /// of -1 for the rest of the list; any other negative limit gives an empty page.
     bool ListUser(const Json::Value& params, Json::Value& result);
 
-    /// Adds the users named in "id" and fills "chrootuser_id" of `result` with them.
+    /// Adds the users named in "id" and fills "chrootuser_id" of `result` with them. Elements that are no
+    /// text are left out; when nothing is left, there is no platform call.
     bool AddUser(const Json::Value& params, Json::Value& result);
 
-    /// Deletes the users named in "id".
+    /// Deletes the users named in "id", with the same rules for its elements.
     bool DeleteUser(const Json::Value& params);
 };
 

@@ -12,8 +12,8 @@ int controlPort(const _tag_VELT_FTP_CONF_& conf);
 /// Whether the record holds a custom passive range: both of its ports are set.
 bool hasCustomRange(const _tag_VELT_FTP_CONF_& conf);
 
-/// The stage operations compare one parameter with the old record and, when it is present and differs, put it into the new
-/// one. They cannot fail and return true, so that they chain with those steps that can.
+/// The stage operations compare one parameter with the old record and, when it is present and differs, put it
+/// into the new one. They cannot fail and return true, so that they chain with those steps that can.
 struct Change {
     const Json::Value& params;
     _tag_VELT_FTP_CONF_ oldConf{};

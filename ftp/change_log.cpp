@@ -10,20 +10,17 @@ namespace {
 
 constexpr int logCategory = 2;
 constexpr int logLevel = 1;
-
-enum FTPEvent : unsigned {
-    serviceEnabled = 0x11B00002,
-    serviceDisabled = 0x11B00006,
-    uploadRateChanged = 0x11B00008,
-    downloadRateChanged = 0x11B00009,
-    passiveRangeChanged = 0x11B0000A,
-    portChanged = 0x11B00012,
-    serviceStarted = 0x11B00013,
-    plainOnlyChanged = 0x11B00019,
-    externalAddressSwitched = 0x11B00020,
-    utf8SupportSwitched = 0x11B00021,
-    connectionLimitChanged = 0x11B00022,
-};
+constexpr unsigned eventServiceEnabled = 0x11B00002;
+constexpr unsigned eventServiceDisabled = 0x11B00006;
+constexpr unsigned eventUploadRateChanged = 0x11B00008;
+constexpr unsigned eventDownloadRateChanged = 0x11B00009;
+constexpr unsigned eventPassiveRangeChanged = 0x11B0000A;
+constexpr unsigned eventPortChanged = 0x11B00012;
+constexpr unsigned eventServiceStarted = 0x11B00013;
+constexpr unsigned eventPlainOnlyChanged = 0x11B00019;
+constexpr unsigned eventExternalAddressSwitched = 0x11B00020;
+constexpr unsigned eventUtf8SupportSwitched = 0x11B00021;
+constexpr unsigned eventConnectionLimitChanged = 0x11B00022;
 
 /// The texts of one entry. A longer text is cut.
 struct EntryTexts {
@@ -31,7 +28,7 @@ struct EntryTexts {
     char newText[32] = {};
 };
 
-void addEntry(FTPEvent event, const char* arg1 = "", const char* arg2 = "") {
+void addEntry(unsigned event, const char* arg1 = "", const char* arg2 = "") {
     VELTLogSet1(logCategory, logLevel, event, arg1, arg2, "", "");
 }
 
@@ -43,7 +40,7 @@ void printRange(char (&text)[32], const _tag_VELT_FTP_CONF_& conf, const VELT_FT
 
 void logPort(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_CONF_& newConf) {
     if (std::strcmp(oldConf.portnum, newConf.portnum) != 0) {
-        addEntry(portChanged, oldConf.portnum, newConf.portnum);
+        addEntry(eventPortChanged, oldConf.portnum, newConf.portnum);
     }
 }
 
@@ -57,12 +54,12 @@ void logPassiveRange(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_CON
     EntryTexts texts;
     printRange(texts.oldText, oldConf, defaultRange);
     printRange(texts.newText, newConf, defaultRange);
-    addEntry(passiveRangeChanged, texts.oldText, texts.newText);
+    addEntry(eventPassiveRangeChanged, texts.oldText, texts.newText);
 }
 
 void logExternalAddress(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_CONF_& newConf) {
     if (oldConf.use_ext_ip != newConf.use_ext_ip) {
-        addEntry(externalAddressSwitched, newConf.use_ext_ip != 0 ? "ON" : "OFF");
+        addEntry(eventExternalAddressSwitched, newConf.use_ext_ip != 0 ? "ON" : "OFF");
     }
 }
 
@@ -70,11 +67,12 @@ void logExternalAddress(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_
 void logPlainOnly(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_CONF_& newConf) {
     if (oldConf.service_flags != newConf.service_flags && (oldConf.service_flags == VELT_FTP_SERVICE_PLAIN ||
                                                            newConf.service_flags == VELT_FTP_SERVICE_PLAIN)) {
-        addEntry(plainOnlyChanged, oldConf.service_flags == VELT_FTP_SERVICE_PLAIN ? "Enabled" : "Disabled");
+        addEntry(eventPlainOnlyChanged,
+                 oldConf.service_flags == VELT_FTP_SERVICE_PLAIN ? "Enabled" : "Disabled");
     }
 }
 
-void logRate(FTPEvent event, int oldRate, int newRate) {
+void logRate(unsigned event, int oldRate, int newRate) {
     if (oldRate != newRate) {
         EntryTexts texts;
         std::snprintf(texts.oldText, sizeof(texts.oldText), "%d KB/s", oldRate);
@@ -89,12 +87,12 @@ void logConnectionLimit(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_
     }
     EntryTexts texts;
     std::snprintf(texts.newText, sizeof(texts.newText), "%d", newConf.max_conn_per_ip);
-    addEntry(connectionLimitChanged, newConf.max_conn_per_ip != 0 ? texts.newText : "Off");
+    addEntry(eventConnectionLimitChanged, newConf.max_conn_per_ip != 0 ? texts.newText : "Off");
 }
 
 void logUtf8Support(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_CONF_& newConf) {
     if (oldConf.support_utf8 != newConf.support_utf8) {
-        addEntry(utf8SupportSwitched, newConf.support_utf8 != 0 ? "On" : "Off");
+        addEntry(eventUtf8SupportSwitched, newConf.support_utf8 != 0 ? "On" : "Off");
     }
 }
 
@@ -103,7 +101,7 @@ void logUtf8Support(const _tag_VELT_FTP_CONF_& oldConf, const _tag_VELT_FTP_CONF
 void FTPServiceHandler::LogChanges(int wasEnabled, int nowEnabled, _tag_VELT_FTP_CONF_* oldConf,
                                    _tag_VELT_FTP_CONF_* newConf) {
     if (wasEnabled != nowEnabled) {
-        addEntry(nowEnabled != 0 ? serviceEnabled : serviceDisabled);
+        addEntry(nowEnabled != 0 ? eventServiceEnabled : eventServiceDisabled);
     }
     if (nowEnabled == 0) {
         return;
@@ -112,11 +110,11 @@ void FTPServiceHandler::LogChanges(int wasEnabled, int nowEnabled, _tag_VELT_FTP
     logPassiveRange(*oldConf, *newConf);
     logExternalAddress(*oldConf, *newConf);
     logPlainOnly(*oldConf, *newConf);
-    logRate(downloadRateChanged, oldConf->maxdownloadrate, newConf->maxdownloadrate);
-    logRate(uploadRateChanged, oldConf->maxuploadrate, newConf->maxuploadrate);
+    logRate(eventDownloadRateChanged, oldConf->maxdownloadrate, newConf->maxdownloadrate);
+    logRate(eventUploadRateChanged, oldConf->maxuploadrate, newConf->maxuploadrate);
     logConnectionLimit(*oldConf, *newConf);
     logUtf8Support(*oldConf, *newConf);
     if (wasEnabled != nowEnabled) {
-        addEntry(serviceStarted);
+        addEntry(eventServiceStarted);
     }
 }

@@ -328,8 +328,8 @@ bool FTPServiceHandler::SetData(const Json::Value& params) {
     }
     change.newConf = change.oldConf;
 
-    // The order of effects. A setting with a setter of its own is in force as soon as its step is done, the others wait
-    // in the new record for apply().
+    // The order of effects. A setting with a setter of its own is in force as soon as its step is done, the
+    // others wait in the new record for apply().
     const bool staged = change.stageServiceFlag("enable_ftp", VELT_FTP_SERVICE_PLAIN) &&
                         change.stageServiceFlag("enable_ftps", VELT_FTP_SERVICE_TLS) &&
                         stageTimeout(*this, change) && change.stagePort() &&
@@ -383,7 +383,7 @@ int FTPServiceHandler::SetCustomPortConf(const Json::Value& params, const _tag_V
         newConf.passive_port_max = range.last;
         reloadFirewall = true;
     }
-    return range.matched;
+    return std::max(range.matched, 0);
 }
 
 bool FTPServiceHandler::GetExtIP(char* buffer, int size) {

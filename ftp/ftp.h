@@ -34,15 +34,17 @@ public:
     void GetCustomPortConf(Json::Value& result, const _tag_VELT_FTP_CONF_& conf);
 
     /// Stages the custom passive range; sets `reloadFirewall` when it differs. Returns how many numbers
-    /// of "custom_port" could be read.
+    /// of "custom_port" could be read, 0 when it was not looked at.
     int SetCustomPortConf(const Json::Value& params, const _tag_VELT_FTP_CONF_& oldConf,
                           _tag_VELT_FTP_CONF_& newConf, bool& reloadFirewall);
 
-    /// Fills `buffer` of `size` bytes with the external address, "" when none is set.
+    /// Fills `buffer` of `size` bytes with the external address, "" when none is set. A failure is logged;
+    /// sets no error code.
     bool GetExtIP(char* buffer, int size);
 
-    /// Writes the administrator-log entries of a change: `wasEnabled` and `nowEnabled` are 1 when FTP or
-    /// FTPS is enabled before and after it, the records are the one read and the one stored.
+    /// Writes the administrator-log entries of a change. `wasEnabled` is 1 when FTP or FTPS was enabled
+    /// before it, `nowEnabled` is 1 when the stored record has any bit of service_flags set; the records are
+    /// the one read and the one stored.
     void LogChanges(int wasEnabled, int nowEnabled, _tag_VELT_FTP_CONF_* oldConf,
                     _tag_VELT_FTP_CONF_* newConf);
 };

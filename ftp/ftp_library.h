@@ -80,7 +80,7 @@ int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out);
 /// start. Negative on failure, which leaves the stored record as it was.
 int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf);
 
-/// The idle time-out. The platform settles its unit; callers pass it on as it is.
+/// The idle time-out. The platform settles its unit; callers pass it on as it is, a negative one too.
 int VELTFTPTimeOutGet(void);
 /// Negative on failure.
 int VELTFTPTimeOutSet(int timeout);
@@ -105,7 +105,8 @@ int VELTFTPUmaskEnabledGet(void);
 /// Negative on failure.
 int VELTFTPUmaskEnabledSet(bool enable);
 
-/// Fills the passive range that is in force without a custom one. Callers do not check the result.
+/// Fills the passive range that is in force without a custom one. Negative on failure, which leaves the range
+/// as it was; callers do not check it.
 int VELTFTPDefaultPassivePortGet(VELT_FTP_PORT_RANGE* out);
 
 /// Fills the list with the names of the shares that the mask `selection` selects (0x207: those offered

@@ -7,8 +7,8 @@
 /// The key that carries the UTF-8 setting, which the API version decides.
 const char* utf8Key(int version);
 
-/// Whether the two service switches are booleans and every optional key that is present has its type. The UTF-8 key is not
-/// looked at.
+/// Whether the two service switches are booleans and every optional key that is present has its type. The
+/// UTF-8 key is not looked at.
 bool haveFTPTypes(const Json::Value& params);
 
 /// Whether the UTF-8 key of the version is absent or has its type.

@@ -27,8 +27,8 @@ struct ErrorCode {
     static constexpr int sftpPortConflict = 1951;
 };
 
-// FastWriter's one line of compact JSON, newline at the end, is the form that readers of the log parse; its
-// successor breaks lines differently.
+// FastWriter's one line of compact JSON ends in a newline, which readers of the log parse; its successor
+// leaves that newline out.
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wdeprecated-declarations"
 /// Renders the parameters of a failed request for the log.

@@ -1,5 +1,6 @@
 // System log lines. Each starts with the bare name of the source file and the line that wrote it, so the
-// macros stand where the reason is known: never in a header, nor in a helper that several places share.
+// macros stand where the reason is known: never in a header, a loop over a table, or a helper of the base
+// class.
 #ifndef VELT_HANDLER_LOG_H
 #define VELT_HANDLER_LOG_H
 

@@ -1,4 +1,6 @@
 // The user and group library.
+//
+// Threads: every operation may be called from any thread.
 #ifndef VELT_PLATFORM_ACCOUNT_H
 #define VELT_PLATFORM_ACCOUNT_H
 

@@ -67,7 +67,7 @@ int VLIBCINFOSetKeyValue(const char* key, const char* value);
 int VLIBCErrGet(void);
 
 /// The source file in which the calling thread's last error was raised; never null, "" when there was
-/// none. Valid until the thread's next platform call.
+/// none. Valid until the thread's next call that fails; the three queries of the last error do not end it.
 const char* VLIBCErrorGetFile(void);
 
 /// The line at which the calling thread's last error was raised; 0 when there was none.

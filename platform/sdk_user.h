@@ -1,4 +1,6 @@
 // User records of the platform's C++ kit.
+//
+// Threads: every operation may be called from any thread; a loaded user belongs to the thread that loaded it.
 #ifndef VELT_PLATFORM_SDK_USER_H
 #define VELT_PLATFORM_SDK_USER_H
 

@@ -9,7 +9,8 @@
 extern "C" {
 #endif
 
-/// Non-zero when the service is enabled, 0 when it is not.
+/// Non-zero when the stored settings enable the service, whether or not it runs now; 0 when they do not. A
+/// negative result reads as enabled.
 int VLIBServiceIsEnabled(const char* service);
 
 /// Starts a daemon. `flags` is 0. Negative on failure.
@@ -22,14 +23,15 @@ int VLIBServicectlStop(const char* service, int flags);
 /// after it was stopped. Negative on failure.
 int VLIBServicecfgRunKeySet(const char* service, int value);
 
-/// Starts a service and marks it enabled. `flags` is 0. Negative on failure.
+/// Starts a service, and sets its run key to 1. `flags` is 0. Negative on failure.
 int VLIBServiceStart(const char* service, int flags);
 
-/// Stops a service and marks it disabled; stopping one that does not run succeeds. `flags` is 0.
-/// Negative on failure.
+/// Stops a service and its sessions, and sets its run key to 2; stopping one that does not run succeeds.
+/// `flags` is 0. Negative on failure.
 int VLIBServiceStop(const char* service, int flags);
 
-/// Pauses a running service: it takes no new sessions until it is resumed. Negative on failure.
+/// Pauses a running service: it takes no new sessions until it is resumed, while those that run go on.
+/// Negative on failure.
 int VLIBServicePause(const char* service);
 
 /// Resumes a paused service, which takes up the stored settings. Negative on failure.

@@ -1,4 +1,6 @@
 // The SFTP configuration library.
+//
+// Threads: every operation may be called from any thread.
 #ifndef VELT_PLATFORM_SFTP_H
 #define VELT_PLATFORM_SFTP_H
 
@@ -30,7 +32,8 @@ int VELTSFTPConfigGet(int which, _tag_VELT_SFTP_CONFIG_* out);
 /// Stores the enable flag and the port. Negative on failure.
 int VELTSFTPConfigSet(int enable, int port);
 
-/// Non-zero while the SFTP service runs, whatever the stored settings say.
+/// Non-zero while the SFTP service runs, whatever the stored settings say. A negative result reads as
+/// running.
 int VELTSFTPIsAlive(void);
 
 #ifdef __cplusplus

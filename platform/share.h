@@ -1,4 +1,6 @@
 // The share library.
+//
+// Threads: every operation may be called from any thread; a share belongs to the thread that looked it up.
 #ifndef VELT_PLATFORM_SHARE_H
 #define VELT_PLATFORM_SHARE_H
 

@@ -1,5 +1,8 @@
 // The web API framework: requests, responses, the port registry, and the table by which a module says
 // what it serves.
+//
+// Threads: a request and its response belong to the thread that runs the entry function. Entry functions and
+// IsPortConflict may be called from any thread.
 #ifndef VELT_PLATFORM_WEBAPI_H
 #define VELT_PLATFORM_WEBAPI_H
 

@@ -37,25 +37,19 @@ struct Change {
     const Json::Value& params;
     _tag_VELT_FTP_CONF_ oldConf{};
     _tag_VELT_FTP_CONF_ newConf{};
-    bool changed = false;
+    bool changed = false; ///< something differs: store, and restart the daemons
 
     bool has(const char* key) const { return !params[key].isNull(); }
+
+    /// Cannot fail; true, so that it chains with those steps that can.
+    bool stageBool(const char* key, int32_t _tag_VELT_FTP_CONF_::*field) {
+        if (has(key) && params[key].asBool() != (oldConf.*field != 0)) {
+            changed = true;
+            newConf.*field = params[key].asBool() ? 1 : 0;
+        }
+        return true;
+    }
 };
-
-void stageBool(Change& change, const char* key, int32_t _tag_VELT_FTP_CONF_::*field) {
-    if (change.has(key) && change.params[key].asBool() != (change.oldConf.*field != 0)) {
-        change.changed = true;
-        change.newConf.*field = change.params[key].asBool() ? 1 : 0;
-    }
-}
-
-// The change flag waits for the name as it is stored, perhaps cut, and for the rules that it must pass.
-void stageShareName(Change& change) {
-    if (change.has("anonymous_chroot_share")) {
-        std::snprintf(change.newConf.anonymous_chroot_share, sizeof(change.newConf.anonymous_chroot_share),
-                      "%s", change.params["anonymous_chroot_share"].asCString());
-    }
-}
 
 /// The rules hold for the merged record, whether or not the request touched these settings.
 bool checkAnonymousChroot(FTPSecurityServiceHandler& handler, const _tag_VELT_FTP_CONF_& conf) {
@@ -73,8 +67,23 @@ bool checkAnonymousChroot(FTPSecurityServiceHandler& handler, const _tag_VELT_FT
     return true;
 }
 
+/// The name counts as it is stored, perhaps cut: for the rules as for the comparison.
+bool stageShare(FTPSecurityServiceHandler& handler, Change& change) {
+    char(&name)[sizeof(change.newConf.anonymous_chroot_share)] = change.newConf.anonymous_chroot_share;
+    if (change.has("anonymous_chroot_share")) {
+        std::snprintf(name, sizeof(name), "%s", change.params["anonymous_chroot_share"].asCString());
+    }
+    if (!checkAnonymousChroot(handler, change.newConf)) {
+        return false;
+    }
+    if (std::strcmp(name, change.oldConf.anonymous_chroot_share) != 0) {
+        change.changed = true;
+    }
+    return true;
+}
+
 /// The umask switch lives outside the record; a change of it alone leads to the store and restart too.
-bool applyUmask(ServiceHandler& handler, Change& change) {
+bool stageUmask(ServiceHandler& handler, Change& change) {
     if (!change.has("enable_umask") ||
         change.params["enable_umask"].asBool() == (VELTFTPUmaskEnabledGet() != 0)) {
         return true;
@@ -103,7 +112,7 @@ bool apply(ServiceHandler& handler, const Change& change) {
     return true;
 }
 
-void addEntry(unsigned event, const char* arg1) {
+void addEntry(unsigned event, const char* arg1 = "") {
     VELTLogSet1(logCategory, logLevel, event, arg1, "", "", "");
 }
 
@@ -171,17 +180,11 @@ bool FTPSecurityServiceHandler::SetData(const Json::Value& params) {
         return VELT_FAIL(*this, ErrorCode::operationFailed, "Failed to get FTP config.");
     }
     change.newConf = change.oldConf;
-    stageBool(change, "user_chroot", &_tag_VELT_FTP_CONF_::user_chroot);
-    stageBool(change, "anonymous", &_tag_VELT_FTP_CONF_::anonymous);
-    stageBool(change, "anonymous_chroot", &_tag_VELT_FTP_CONF_::anonymous_chroot);
-    stageShareName(change);
-    if (!checkAnonymousChroot(*this, change.newConf)) {
-        return false;
-    }
-    if (std::strcmp(change.newConf.anonymous_chroot_share, change.oldConf.anonymous_chroot_share) != 0) {
-        change.changed = true;
-    }
-    if (!applyUmask(*this, change)) {
+    const bool staged = change.stageBool("user_chroot", &_tag_VELT_FTP_CONF_::user_chroot) &&
+                        change.stageBool("anonymous", &_tag_VELT_FTP_CONF_::anonymous) &&
+                        change.stageBool("anonymous_chroot", &_tag_VELT_FTP_CONF_::anonymous_chroot) &&
+                        stageShare(*this, change) && stageUmask(*this, change);
+    if (!staged) {
         return false;
     }
     if (!change.changed) {
@@ -231,7 +234,7 @@ bool FTPSecurityServiceHandler::IsFTPShare(const char* share) {
 
 void FTPSecurityServiceHandler::LogChanges(_tag_VELT_FTP_CONF_* oldConf, _tag_VELT_FTP_CONF_* newConf) {
     if (oldConf->anonymous != newConf->anonymous) {
-        addEntry(newConf->anonymous != 0 ? eventAnonymousAllowed : eventAnonymousRefused, "");
+        addEntry(newConf->anonymous != 0 ? eventAnonymousAllowed : eventAnonymousRefused);
     }
     if (oldConf->anonymous_chroot != newConf->anonymous_chroot) {
         addEntry(eventAnonymousChroot, newConf->anonymous_chroot != 0 ? "started" : "stopped");

@@ -29,8 +29,8 @@ public:
     /// Applies checked parameters. Nothing is rolled back after a failure.
     bool SetData(const Json::Value& params);
 
-    /// Fills "share" of `result` with the names of the shares offered to FTP, the home folders left out. Whether
-    /// an account may reach them is not asked.
+    /// Fills "share" of `result` with the names of the shares offered to FTP, the home folders left out.
+    /// Whether an account may reach them is not asked.
     bool GetShareData(Json::Value& result);
 
     /// Whether the account "ftp" can reach the share. Any failure is logged and means no; sets no error code.

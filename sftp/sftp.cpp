@@ -19,9 +19,13 @@ constexpr int logLevel = 1;
 constexpr unsigned eventPortChanged = 0x11B00035;
 constexpr unsigned eventEnabled = 0x11B00036;
 
+void addEntry(unsigned event, const char* arg1 = "", const char* arg2 = "") {
+    VELTLogSet1(logCategory, logLevel, event, arg1, arg2, "", "");
+}
+
 /// Brings the service into the state that the new record asks for.
-bool control(ServiceHandler& handler, const _tag_VELT_SFTP_CONFIG_& oldConf,
-             const _tag_VELT_SFTP_CONFIG_& newConf) {
+bool controlService(ServiceHandler& handler, const _tag_VELT_SFTP_CONFIG_& oldConf,
+                    const _tag_VELT_SFTP_CONFIG_& newConf) {
     if (newConf.enable == 0) {
         if (VLIBServiceStop(service, 0) < 0) {
             return VELT_FAIL_LAST_ERROR(handler, ErrorCode::operationFailed,
@@ -43,8 +47,8 @@ bool control(ServiceHandler& handler, const _tag_VELT_SFTP_CONFIG_& oldConf,
     return true;
 }
 
-/// Stores the new record and makes the running service follow it. Running sessions outlive the pause; after a failure
-/// the service stays paused, until a later change resumes it.
+/// Stores the new record and makes the running service follow it. Running sessions outlive the pause; after a
+/// failure the service stays paused, until a later change resumes it.
 bool apply(ServiceHandler& handler, const _tag_VELT_SFTP_CONFIG_& oldConf,
            const _tag_VELT_SFTP_CONFIG_& newConf) {
     if (oldConf.enable != 0 && VLIBServicePause(service) < 0) {
@@ -57,7 +61,7 @@ bool apply(ServiceHandler& handler, const _tag_VELT_SFTP_CONFIG_& oldConf,
     if (newConf.port != oldConf.port && VELTFwRuleHup() < 0) {
         VELT_LOG("Failed to reload firewall rules.");
     }
-    return control(handler, oldConf, newConf);
+    return controlService(handler, oldConf, newConf);
 }
 
 } // namespace
@@ -154,9 +158,9 @@ void SFTPServiceHandler::LogChanges(_tag_VELT_SFTP_CONFIG_* oldConf, _tag_VELT_S
         char newPort[32] = {};
         std::snprintf(oldPort, sizeof(oldPort), "%d", oldConf->port);
         std::snprintf(newPort, sizeof(newPort), "%d", newConf->port);
-        VELTLogSet1(logCategory, logLevel, eventPortChanged, oldPort, newPort, "", "");
+        addEntry(eventPortChanged, oldPort, newPort);
     }
     if (oldConf->enable != newConf->enable) {
-        VELTLogSet1(logCategory, logLevel, eventEnabled, "", "", "", "");
+        addEntry(eventEnabled);
     }
 }

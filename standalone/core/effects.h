@@ -22,9 +22,9 @@ enum class Effect {
 /// The effect's name: "store", "firewall", "stop", "start", "run key", "event", "log".
 std::string_view effectName(Effect effect);
 
-/// Does the effect by calling `act` and returns its result (negative: failed, last error set). `subject` says what
-/// it concerns ("ftp settings", "ftpd", "velt.service.action"). The hook of the calling thread, when there is one, is
-/// asked first.
+/// Does the effect by calling `act` and returns its result (negative: failed, last error set). `subject` says
+/// what it concerns ("ftp settings", "ftpd", "velt.service.action"). The hook of the calling thread, when
+/// there is one, is asked first.
 int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
 
 /// What a hook decides about one effect: do it, or leave it undone with this result.

@@ -11,8 +11,8 @@
 
 namespace velt {
 
-/// Replaces the file by one with `contents`: temporary file, fsync, rename, fsync of the folder, which is made
-/// when it is missing. After a crash at any moment the old or the new file stands there, whole. Negative
+/// Replaces the file by one with `contents`: temporary file, fsync, rename, fsync of the folder, which is
+/// made when it is missing. After a crash at any moment the old or the new file stands there, whole. Negative
 /// on failure, with the last error set.
 int replaceFile(const std::filesystem::path& path, std::string_view contents, mode_t mode);
 

@@ -2,7 +2,6 @@
 #ifndef VELT_STANDALONE_CORE_LAST_ERROR_H
 #define VELT_STANDALONE_CORE_LAST_ERROR_H
 
-#include <source_location>
 #include <string>
 
 namespace velt {
@@ -22,10 +21,20 @@ enum class ErrorNumber {
     outOfMemory = 0x0800,
 };
 
+/// A place in the source. (std::source_location is not there with every compiler that builds this.)
+struct SourcePlace {
+    const char* file = "";
+    int line = 0;
+
+    /// The place of the call; as a default argument, that of the caller's call.
+    static constexpr SourcePlace current(const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
+        return {file, line};
+    }
+};
+
 /// Records the error for the calling thread and returns -1, so that a failing operation ends with
 /// `return fail(...)`. The sentence says what failed and why, and ends with a full stop.
-int fail(ErrorNumber number, std::string sentence,
-         std::source_location where = std::source_location::current());
+int fail(ErrorNumber number, std::string sentence, SourcePlace where = SourcePlace::current());
 
 /// The sentence of the calling thread's last error; "" when there was none.
 const std::string& lastErrorSentence();

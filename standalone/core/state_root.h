@@ -9,7 +9,7 @@ namespace velt {
 
 /// Chooses the root folder. To be called before any other operation, or by tests between them; not
 /// thread-safe. The environment variable VELT_STATE_ROOT sets it where nobody calls this.
-void setStateRoot(std::filesystem::path root);
+void setStateRoot(const std::filesystem::path& root);
 
 /// The place of a file below the root: statePath("/etc/velt/ftp.conf").
 std::filesystem::path statePath(std::string_view absolutePath);

@@ -29,13 +29,32 @@ struct SftpSettings {
 /// The passive range in force without a custom one.
 inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
 
-/// The stored settings, the defaults before the first store; nothing, with the last error set (file and line), when a file
-/// cannot be read or is damaged.
+/// What is in force before the first store: both services off, port 21, UTF-8 from the start.
+FtpSettings defaultFtpSettings();
+
+/// Writes the default settings into the files that are not there yet; leaves the others alone, whatever they
+/// hold. Negative on failure, with the last error set.
+int writeMissingSettings();
+
+/// The control port of the record; 0 when its text is no decimal number of 1 to 65535.
+int controlPort(const _tag_VELT_FTP_CONF_& record);
+
+/// Whether the record has a custom passive range in force.
+bool hasCustomPassiveRange(const _tag_VELT_FTP_CONF_& record);
+
+/// The passive range in force: the custom one, or the default.
+VELT_FTP_PORT_RANGE passiveRange(const _tag_VELT_FTP_CONF_& record);
+
+/// Whether the text is a dotted IPv4 address ("192.0.2.1").
+bool isIPv4Address(const std::string& text);
+
+/// The stored settings, the defaults before the first store; nothing, with the last error set (file and
+/// line), when a file cannot be read or is damaged.
 std::optional<FtpSettings> loadFtpSettings();
 std::optional<SftpSettings> loadSftpSettings();
 
-/// Whether a daemon would take these settings: negative, with the last error's sentence naming the setting, the value and
-/// what is allowed, when it would not. Looks at numbers and texts only, starts nothing.
+/// Whether a daemon would take these settings: negative, with the last error's sentence naming the setting,
+/// the value and what is allowed, when it would not. Looks at numbers and texts only, starts nothing.
 int checkFtpSettings(const FtpSettings& settings);
 int checkSftpSettings(const SftpSettings& settings);
 

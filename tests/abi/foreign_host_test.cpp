@@ -1,4 +1,5 @@
-// A process without the platform's symbols cannot load the module: it learns so at once, not at the first request.
+// A process without the platform's symbols cannot load the module: it learns so at once, not at the first
+// request.
 
 #include <dlfcn.h>
 #include <gtest/gtest.h>

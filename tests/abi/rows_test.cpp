@@ -133,8 +133,6 @@ TEST_F(Rows, ARefusedRequestIsAnsweredWithItsCode) {
 
 TEST_F(Rows, AnExceptionOfTheFrameworkReachesTheFramework) {
     platform.throwFrom("APIRequest::GetParam");
-    fake::Request request;
-    fake::Response response;
     EXPECT_THROW(call(sftp, 1, "set"), fake::Thrown);
 }
 

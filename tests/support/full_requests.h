@@ -1,4 +1,5 @@
-// One request for each row of the table that goes through as many platform calls as the row has, with the state it needs.
+// One request for each row of the table that goes through as many platform calls as the row has, with the
+// state it needs.
 #ifndef VELT_TESTS_SUPPORT_FULL_REQUESTS_H
 #define VELT_TESTS_SUPPORT_FULL_REQUESTS_H
 

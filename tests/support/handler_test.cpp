@@ -62,8 +62,18 @@ void HandlerTest::TearDown() {
     }
 }
 
+void HandlerTest::startAfresh() {
+    SCOPED_TRACE("at the end of the round before");
+    TearDown();
+    SetUp();
+}
+
 Lines HandlerTest::run(VELT::APIEntryFunction entry, const std::string& params) {
-    fake::Request request(json(params));
+    return runWith(entry, json(params));
+}
+
+Lines HandlerTest::runWith(VELT::APIEntryFunction entry, const Json::Value& params) {
+    fake::Request request(params);
     fake::Response response;
     platform.journal.clear();
     entry(&request, &response);

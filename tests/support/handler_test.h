@@ -1,5 +1,5 @@
-// The frame of a handler test: a request, run through an entry function over the fake platform, and the whole journal
-// of what it did: platform calls, system log lines and the answer, in order.
+// The frame of a handler test: a request, run through an entry function over the fake platform, and the whole
+// journal of what it did: platform calls, system log lines and the answer, in order.
 #ifndef VELT_TESTS_SUPPORT_HANDLER_TEST_H
 #define VELT_TESTS_SUPPORT_HANDLER_TEST_H
 
@@ -20,8 +20,8 @@ Json::Value json(const std::string& text);
 /// Both lists of lines, one after the other.
 Lines operator+(Lines first, const Lines& second);
 
-/// The journal line of a system log line: `message` is the format after the leading "%s:%d ", `arguments` what fills
-/// it, as the journal shows arguments.
+/// The journal line of a system log line: `message` is the format after the leading "%s:%d ", `arguments`
+/// what fills it, as the journal shows arguments.
 std::string logLine(const std::string& source, const std::string& message, const std::string& arguments = "");
 
 /// How every request that takes parameters begins.
@@ -33,18 +33,25 @@ Lines failed(const std::string& source, int code, const std::string& params);
 /// How a request ends that succeeded with `data` (compact JSON).
 std::string succeeded(const std::string& data = "null");
 
-/// Resets the platform before each test; after it, no handle may be left, and everything that was to fail must have been
-/// called.
+/// Resets the platform before each test; after it, no handle may be left, and everything that was to fail
+/// must have been called.
 class HandlerTest : public testing::Test {
 protected:
     void SetUp() override;
     void TearDown() override;
 
+    /// Ends one round of a test and begins the next: checks what is checked after a test, and leaves the
+    /// platform as SetUp() does.
+    void startAfresh();
+
     /// Runs one request and returns the journal of it alone. The answer is checked to be exactly one.
     Lines run(VELT::APIEntryFunction entry, const std::string& params = "{}");
 
-    /// Runs one request whose entry function lets an exception pass, returns the journal, and checks that there was no
-    /// answer.
+    /// The same with parameters that JSON text cannot express, such as a number's type.
+    Lines runWith(VELT::APIEntryFunction entry, const Json::Value& params);
+
+    /// Runs one request whose entry function lets an exception pass, returns the journal, and checks that
+    /// there was no answer.
     template<typename Exception>
     Lines runThrowing(VELT::APIEntryFunction entry, const std::string& params = "{}") {
         fake::Request request(json(params));

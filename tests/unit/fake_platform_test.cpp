@@ -220,6 +220,9 @@ TEST_F(FakePlatform, ReadsTheRulesItWrites) {
     EXPECT_EQ(isUser, 1);
     EXPECT_STREQ(name, "bob");
     EXPECT_STREQ(path, "/photos/a:b");
+    platform.userFlag = -1;
+    ASSERT_EQ(VELTFTPChrootRuleParseToName(line, &isUser, name, sizeof(name), path, sizeof(path)), 0);
+    EXPECT_EQ(isUser, -1);
     for (const char* bad : {"", "user:1000", "user:7:/x", "group:1000:/x", "user:bob:/x"}) {
         EXPECT_LT(VELTFTPChrootRuleParseToName(bad, &isUser, name, sizeof(name), path, sizeof(path)), 0)
             << bad;
@@ -240,6 +243,33 @@ TEST_F(FakePlatform, NarrowsAndMovesChrootUsers) {
     EXPECT_TRUE(platform.chrootUsers.empty());
     VLIBCSzListFree(list);
     EXPECT_EQ(platform.journal[1], R"(VELTFTPNonChrootUserEnum(list1, 1, "bob", null))");
+}
+
+TEST_F(FakePlatform, NarrowsByTheSourceAndDomainOfTheUsersItKnows) {
+    platform.users = {{"ann", {"", 1000, fake::sourceLocal, ""}}, {"LAB\\eve", {"", 1001, 2, "LAB"}}};
+    platform.chrootUsers = {"ann", "bob", "LAB\\eve"};
+    VLIBCSzList* list = VLIBCSzListAlloc(8);
+    ASSERT_EQ(VELTFTPChrootUserEnum(&list, 2, nullptr, nullptr), 0);
+    EXPECT_EQ(textsOf(list), (Lines{"bob", "LAB\\eve"}));
+    ASSERT_EQ(VELTFTPChrootUserEnum(&list, fake::everySource, nullptr, "LAB"), 0);
+    EXPECT_EQ(textsOf(list), (Lines{"bob", "LAB\\eve"}));
+    ASSERT_EQ(VELTFTPChrootUserEnum(&list, 1, nullptr, nullptr), 0);
+    EXPECT_EQ(textsOf(list), (Lines{"ann", "bob"}));
+    VLIBCSzListFree(list);
+}
+
+TEST_F(FakePlatform, SetsTheLastErrorOfALookUpUnlessTheTestDid) {
+    VELT_SHARE* share = nullptr;
+    EXPECT_LT(VELTShareGet("nowhere", &share), 0);
+    EXPECT_NE(VLIBCErrGet(), 0);
+    platform.lastError = {0x2A, "share.c", 7};
+    EXPECT_LT(VELTShareGet("nowhere", &share), 0);
+    EXPECT_EQ(VLIBCErrGet(), 0x2A);
+    EXPECT_STREQ(VLIBCErrorGetFile(), "share.c");
+    platform.lastError = {};
+    platform.fail("VELTShareGet", 3);
+    EXPECT_LT(VELTShareGet("nowhere", &share), 0);
+    EXPECT_EQ(VLIBCErrGet(), 0) << "what a test makes fail has the error that the test sets";
 }
 
 TEST_F(FakePlatform, FindsPortsThatOthersHold) {
@@ -273,14 +303,13 @@ TEST_F(FakePlatform, CapturesSyslog) {
            9);
     syslog(LOG_ERR, "%s:%d Request: %s", "handler", 19, "{}\n");
     syslog(LOG_INFO, "plain 100%% %u %c", 7U, 'x');
-    EXPECT_EQ(
-        platform.journal,
-        (Lines{
-            R"(syslog(3, "%s:%d Failed to set FTP timeout.", "ftp"))",
-            R"(syslog(3, "%s:%d Failed to VELTUserGet(). [%s][0x%04X %s:%d]", "chroot", "bob", 0x19, "user.c", 9))",
-            R"(syslog(3, "%s:%d Request: %s", "handler", "{}\n"))",
-            R"(syslog(6, "plain 100%% %u %c", 7, "x"))",
-        }));
+    EXPECT_EQ(platform.journal, (Lines{
+                                    R"(syslog(3, "%s:%d Failed to set FTP timeout.", "ftp"))",
+                                    R"(syslog(3, "%s:%d Failed to VELTUserGet(). [%s][0x%04X %s:%d]", )"
+                                    R"("chroot", "bob", 0x19, "user.c", 9))",
+                                    R"(syslog(3, "%s:%d Request: %s", "handler", "{}\n"))",
+                                    R"(syslog(6, "plain 100%% %u %c", 7, "x"))",
+                                }));
     ASSERT_EQ(platform.logLines.size(), 4U);
     const fake::LogLine& line = platform.logLines[1];
     EXPECT_EQ(line.priority, LOG_ERR);

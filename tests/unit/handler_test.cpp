@@ -2,7 +2,12 @@
 
 #include "handler/handler.h"
 
+#include "chroot/chroot.h"
+#include "chroot/chrootuser.h"
+#include "ftp/ftp.h"
 #include "handler/log.h"
+#include "security/security.h"
+#include "sftp/sftp.h"
 #include "tests/support/handler_test.h"
 
 #include <type_traits>
@@ -14,6 +19,13 @@ protected:
     fake::Request request;
     fake::Response response;
     ServiceHandler handler{&request, &response};
+};
+
+/// A handler class whose version can be seen.
+template<typename Base> class Opened : public Base {
+public:
+    using Base::Base;
+    using Base::version_;
 };
 
 TEST_F(Handler, FailsWithTheFirstCodeThatWasSet) {
@@ -63,6 +75,30 @@ TEST_F(Handler, SucceedsWithItsData) {
 
 TEST_F(Handler, HasNoVirtualOperations) {
     EXPECT_FALSE(std::is_polymorphic_v<ServiceHandler>);
+    EXPECT_FALSE(std::is_polymorphic_v<FTPServiceHandler>);
+    EXPECT_FALSE(std::is_polymorphic_v<FTPSecurityServiceHandler>);
+    EXPECT_FALSE(std::is_polymorphic_v<FTPChrootUserServiceHandler>);
+    EXPECT_FALSE(std::is_polymorphic_v<FTPChrootServiceHandler>);
+    EXPECT_FALSE(std::is_polymorphic_v<SFTPServiceHandler>);
+}
+
+TEST_F(Handler, ServesVersion1WhenNoneIsGiven) {
+    EXPECT_EQ(Opened<FTPServiceHandler>(&request, &response).version_, 1);
+    EXPECT_EQ(Opened<FTPSecurityServiceHandler>(&request, &response).version_, 1);
+    EXPECT_EQ(Opened<FTPChrootUserServiceHandler>(&request, &response).version_, 1);
+    EXPECT_EQ(Opened<FTPChrootServiceHandler>(&request, &response).version_, 1);
+    EXPECT_EQ(Opened<SFTPServiceHandler>(&request, &response).version_, 1);
+}
+
+TEST_F(Handler, ServesTheVersionThatIsGiven) {
+    EXPECT_EQ(Opened<FTPServiceHandler>(&request, &response, 3).version_, 3);
+    EXPECT_EQ(Opened<SFTPServiceHandler>(&request, &response, 3).version_, 3);
+}
+
+TEST_F(Handler, OfSFTPAnswersTheRequestWhateverItsVersion) {
+    SFTPServiceHandler(&request, &response, 3).Get();
+    EXPECT_EQ(platform.journal, (Lines{"VELTSFTPConfigGet(1)", "VELTSFTPIsAlive()",
+                                       succeeded(R"({"enable":false,"portnum":22})")}));
 }
 
 TEST(SourceName, IsTheFileWithoutFolderAndExtension) {

@@ -1,5 +1,5 @@
-// Any JSON type for any key: the request gets exactly one answer, or the JSON library's own exception where the parameters
-// or a rule are no object. Never a crash, never a handle left.
+// Any JSON type for any key: the request gets exactly one answer, or the JSON library's own exception where
+// the parameters or a rule are no object. Never a crash, never a handle left.
 
 #include "tests/support/full_requests.h"
 #include "tests/support/handler_test.h"
@@ -41,7 +41,7 @@ class JsonTypes : public HandlerTest, public testing::WithParamInterface<FullReq
 protected:
     /// Whether the request with these parameters was answered; otherwise the JSON library threw.
     bool answers(const Json::Value& params) {
-        platform.reset();
+        startAfresh();
         GetParam().prepare(platform);
         fake::Request request(params);
         fake::Response response;
@@ -57,7 +57,8 @@ protected:
     }
 };
 
-// A set of rules that is an object cannot be indexed by number; what is no text reads as text where it can.
+// A set of rules that is an object with members cannot be indexed by number, and an array whose elements are
+// no objects has no keys.
 bool mayThrow(const std::string& key, const Json::Value& value) {
     return key == "rules" && ((value.isObject() && !value.empty()) || (value.isArray() && !value.empty()));
 }

@@ -31,7 +31,7 @@ int VELTUserGet(const char* name, VELT_USER** out) {
     }
     const auto user = platform.users.find(name);
     if (user == platform.users.end()) {
-        return -1;
+        return platform.notFound(__FILE__, __LINE__);
     }
     auto* block = recordFor<UserBlock>(*out, "VELTUserGet");
     if (block == nullptr) {
@@ -52,7 +52,7 @@ int VELTGroupGet(const char* name, VELT_GROUP** out) {
     }
     const auto group = platform.groups.find(name);
     if (group == platform.groups.end()) {
-        return -1;
+        return platform.notFound(__FILE__, __LINE__);
     }
     auto* block = recordFor<GroupBlock>(*out, "VELTGroupGet");
     if (block == nullptr) {

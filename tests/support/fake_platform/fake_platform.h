@@ -40,9 +40,15 @@ struct ShareState {
     int privilege = 2; ///< the effective code that every account has on the share
 };
 
+/// Where users come from, as the enumerators of the chroot users count the sources.
+inline constexpr int sourceLocal = 1;
+inline constexpr int everySource = 11;
+
 struct UserState {
     std::string descr;
     int uid = 0;
+    int source = everySource;                         ///< the sources that list the user
+    std::optional<std::string> domain = std::nullopt; ///< nullopt: any domain; "": none
 };
 
 /// One captured line of the system log.
@@ -68,10 +74,12 @@ struct State {
     std::optional<std::string> extIp;
     /// The other keys of that file. No other file exists: reading from one fails.
     std::map<std::string, std::string> infoKeys;
-    LastError lastError; ///< stays as the test sets it: no call changes it
+    /// What a test sets stays. Where it set no number, a look-up of a share, user, group or rule that finds nothing
+    /// sets one.
+    LastError lastError;
 
-    /// What VLIBServiceIsEnabled answers, 0 for a service not named. A run key of 1 and
-    /// VLIBServiceStart set 1, a run key of 2 and VLIBServiceStop set 0.
+    /// What VLIBServiceIsEnabled answers, 0 for a service not named. A run key of 1 and VLIBServiceStart set 1, a run
+    /// key of 2 and VLIBServiceStop set 0; VELTFTPConfSet and VELTSFTPConfigSet set what they store.
     std::map<std::string, int> services;
     std::map<std::string, int> runKeys;
     std::set<std::string> running; ///< what was started and not stopped
@@ -82,7 +90,7 @@ struct State {
 
     std::map<std::string, ShareState> shares;
     std::vector<std::string> ftpShares; ///< what VELTFTPShareEnum lists, whatever the mask
-    /// Both are narrowed by the substring alone; source and domain are only journalled.
+    /// Both are narrowed by the substring; by source and domain only those who stand in `users`.
     std::vector<std::string> chrootUsers;
     std::vector<std::string> nonChrootUsers;
     std::map<std::string, UserState> users; ///< for VELTUserGet, SDK::User and the rules
@@ -91,14 +99,17 @@ struct State {
     /// Stored rule lines, "user:<uid>:<path>" or "group:<gid>:<path>". A line of another form, or with
     /// an id that `users` or `groups` does not have, is not parsed.
     std::vector<std::string> rules;
+    int userFlag = 1; ///< what the parser of a rule gives for a user
 
     /// Ports by the service that holds them. A conflict is a port of the range that a service other
-    /// than the asking one holds.
+    /// than the asking one holds, here or in storedPorts.
     std::map<std::string, std::set<int>> takenPorts;
+    /// The same for "ftp" and "ssh", as VELTFTPConfSet and VELTSFTPConfigSet stored their ports; nothing before.
+    std::map<std::string, std::vector<VELT_FTP_PORT_RANGE>> storedPorts;
 
     bool journalListGets = false; ///< VLIBCSzListGet
-    /// VLIBCErrGet, VLIBCErrorGetFile, VLIBCErrorGetLine. Off by default also because compilers differ
-    /// in the order in which they evaluate the three as arguments of one call.
+    /// VLIBCErrGet, VLIBCErrorGetFile, VLIBCErrorGetLine. Off by default: the log line that asks for them
+    /// shows what they gave.
     bool journalErrorGets = false;
 
     bool enumeratorsReplaceList = false;       ///< a new list stands where the old one stood
@@ -135,8 +146,9 @@ public:
     /// is no longer valid shows as "list1 (moved)" or "list1 (freed)".
     ///
     /// VELTFTPConfSet shows the fields that differ from the stored record. A list that is an input shows
-    /// as: list1 flags=16 ["a", "b"]. A syslog line shows the priority, the format, the source name and the
-    /// arguments after the line number; the number itself shows only when it is not positive.
+    /// as: list1 flags=16 ["a", "b"]; one that is pushed to shows its flags when they are not 0. A syslog
+    /// line shows the priority, the format, the source name and the arguments after the line number; the
+    /// number itself shows only when it is not positive.
     std::vector<std::string> journal;
 
     std::vector<LogLine> logLines;
@@ -179,6 +191,8 @@ public:
     /// the test asked for it.
     std::optional<int> enter(const std::string& operation, const std::string& arguments,
                              bool journalled = true);
+    /// For those that find nothing: sets the last error, unless the test did, and returns a negative result.
+    int notFound(const char* file, int line);
     HandleTable& handles() { return *handles_; }
 
 private:

@@ -57,14 +57,14 @@ int VELTFTPChrootRuleParseToName(const char* line, int* isUser, char* name, int 
     static const std::regex form("(user|group):([0-9]+):([^]*)");
     std::cmatch parts;
     if (line == nullptr || !std::regex_match(line, parts, form)) {
-        return -1;
+        return Platform::instance().notFound(__FILE__, __LINE__);
     }
     const bool user = parts[1] == "user";
     const auto account = user ? userCalled(parts[2]) : groupCalled(parts[2]);
     if (!account || copyWhole(name, nameSize, *account) < 0 || copyWhole(path, pathSize, parts[3]) < 0) {
-        return -1;
+        return Platform::instance().notFound(__FILE__, __LINE__);
     }
-    *isUser = user ? 1 : 0;
+    *isUser = user ? Platform::instance().userFlag : 0;
     return 0;
 }
 

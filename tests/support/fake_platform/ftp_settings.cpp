@@ -5,6 +5,9 @@
 #include "tests/support/fake_platform/ftp_record.h"
 #include "tests/support/fake_platform/text.h"
 
+#include <cstdlib>
+#include <cstring>
+
 using fake::arguments;
 using fake::Platform;
 using fake::Verbatim;
@@ -21,6 +24,22 @@ int setNumber(const char* operation, int& stored, int value) {
     }
     stored = value;
     return 0;
+}
+
+/// What other operations answer follows from the stored record, until they are told otherwise.
+void followRecord() {
+    auto& platform = Platform::instance();
+    const auto& conf = platform.conf;
+    const int plain = (conf.service_flags & VELT_FTP_SERVICE_PLAIN) != 0 ? 1 : 0;
+    const int tls = (conf.service_flags & VELT_FTP_SERVICE_TLS) != 0 ? 1 : 0;
+    platform.services["ftpd"] = plain;
+    platform.services["ftpd-pure"] = plain;
+    platform.services["ftpd-ssl"] = tls;
+    const std::string port(conf.portnum, ::strnlen(conf.portnum, sizeof conf.portnum));
+    const int control = std::atoi(port.c_str());
+    const bool custom = conf.passive_port_min != 0 && conf.passive_port_max != 0;
+    const VELT_FTP_PORT_RANGE passive{conf.passive_port_min, conf.passive_port_max};
+    platform.storedPorts["ftp"] = {{control, control}, custom ? passive : platform.defaultRange};
 }
 
 } // namespace
@@ -41,6 +60,7 @@ int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf) {
         return *failure;
     }
     platform.conf = conf;
+    followRecord();
     return 0;
 }
 

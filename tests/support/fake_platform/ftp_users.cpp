@@ -21,10 +21,21 @@ Verbatim nameOf(const VLIBCSzList* list) {
     return {Platform::instance().handles().nameOf(list)};
 }
 
-Names containing(const Names& names, const char* substr) {
+bool comesFrom(const std::string& name, int source, const char* domain) {
+    const auto& users = Platform::instance().users;
+    const auto user = users.find(name);
+    if (user == users.end()) {
+        return true;
+    }
+    const auto& own = user->second.domain;
+    return (user->second.source & source) != 0 && (domain == nullptr || !own || *own == domain);
+}
+
+Names narrowed(const Names& names, int source, const char* substr, const char* domain) {
     Names found;
     std::copy_if(names.begin(), names.end(), std::back_inserter(found), [&](const std::string& name) {
-        return substr == nullptr || name.find(substr) != std::string::npos;
+        return (substr == nullptr || name.find(substr) != std::string::npos) &&
+               comesFrom(name, source, domain);
     });
     return found;
 }
@@ -55,13 +66,13 @@ int VELTFTPShareEnum(VLIBCSzList** list, int selection) {
 
 int VELTFTPChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain) {
     const auto shown = arguments(nameOf(*list), source, substr, domain);
-    const auto users = containing(Platform::instance().chrootUsers, substr);
+    const auto users = narrowed(Platform::instance().chrootUsers, source, substr, domain);
     return fake::enumerate("VELTFTPChrootUserEnum", shown, list, users);
 }
 
 int VELTFTPNonChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain) {
     const auto shown = arguments(nameOf(*list), source, substr, domain);
-    const auto users = containing(Platform::instance().nonChrootUsers, substr);
+    const auto users = narrowed(Platform::instance().nonChrootUsers, source, substr, domain);
     return fake::enumerate("VELTFTPNonChrootUserEnum", shown, list, users);
 }
 

@@ -105,7 +105,10 @@ const char* VLIBCSzListGet(const VLIBCSzList* list, int index) {
 
 int VLIBCSzListPush(VLIBCSzList** list, const char* text) {
     auto& platform = Platform::instance();
-    const Verbatim name{platform.handles().nameOf(*list)};
+    const auto* before = platform.handles().peek<ListBlock>(*list);
+    const bool flagged = before != nullptr && before->record.flags != 0;
+    const Verbatim name{platform.handles().nameOf(*list) +
+                        (flagged ? " flags=" + std::to_string(before->record.flags) : "")};
     if (const auto failure = platform.enter("VLIBCSzListPush", arguments(name, text))) {
         return *failure;
     }

@@ -103,4 +103,12 @@ std::optional<int> Platform::enter(const std::string& operation, const std::stri
     return std::nullopt;
 }
 
+int Platform::notFound(const char* file, int line) {
+    if (lastError.number == 0) {
+        constexpr int anyNumber = 0x0200;
+        lastError = {anyNumber, file, line};
+    }
+    return -1;
+}
+
 } // namespace fake

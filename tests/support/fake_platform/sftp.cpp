@@ -23,6 +23,8 @@ int VELTSFTPConfigSet(int enable, int port) {
     }
     platform.sftp.enable = enable;
     platform.sftp.port = port;
+    platform.services["sftp"] = enable != 0 ? 1 : 0;
+    platform.storedPorts["ssh"] = {{port, port}};
     return 0;
 }
 

@@ -35,7 +35,7 @@ int VELTShareGet(const char* name, VELT_SHARE** out) {
     if (platform.failedShareGetLeavesShare) {
         *out = makeShare(name, {});
     }
-    return failure.value_or(-1);
+    return failure ? *failure : platform.notFound(__FILE__, __LINE__);
 }
 
 int VELTShareUGPrivGetLocal(const char* account, VELT_SHARE* share, VELT_SHARE_PRIV* out) {

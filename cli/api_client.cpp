@@ -1,0 +1,64 @@
+#include "cli/api_client.h"
+
+#include "cli/json_text.h"
+#include "cli/problem.h"
+
+namespace velt::cli {
+
+namespace {
+
+std::string pathOf(const ApiMethod& method) {
+    return "/api/" + percentEncode(method.api) + "/v" + std::to_string(method.version) + "/" +
+           percentEncode(method.method);
+}
+
+} // namespace
+
+Json::Value ApiClient::exchange(const std::string& method, const std::string& path,
+                                const std::optional<std::string>& body) {
+    const HttpAnswer answer = http_.send(method, path, body);
+    if (answer.status == 204) {
+        return {};
+    }
+    if (answer.status != 200 && answer.status != 201) {
+        throw problemOf(answer, endpoint());
+    }
+    std::string problem;
+    const std::optional<Json::Value> value = parseJson(answer.body, problem);
+    if (!value) {
+        throw Failure(ExitCode::access, "The answer from " + endpoint().name() + " is not JSON.",
+                      "Check that the address is that of veltd (--url, VELT_URL).");
+    }
+    return *value;
+}
+
+Json::Value ApiClient::read(const ApiMethod& method) {
+    return get(pathOf(method));
+}
+
+Json::Value ApiClient::call(const ApiMethod& method, const Json::Value& parameters) {
+    return post(pathOf(method), parameters);
+}
+
+Json::Value ApiClient::get(const std::string& path) {
+    return exchange("GET", path, std::nullopt);
+}
+
+Json::Value ApiClient::post(const std::string& path, const Json::Value& body) {
+    return exchange("POST", path, compactJson(body));
+}
+
+void ApiClient::remove(const std::string& path) {
+    exchange("DELETE", path, std::nullopt);
+}
+
+void ApiClient::follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
+                       const std::function<bool()>& stop) {
+    const HttpAnswer answer = http_.follow(path, onText, stop);
+    // No status at all: stopped before the server answered.
+    if (answer.status != 200 && answer.status != 0) {
+        throw problemOf(answer, endpoint());
+    }
+}
+
+} // namespace velt::cli

@@ -1,0 +1,53 @@
+// The server's methods as calls that return JSON values or throw Failure.
+#ifndef VELT_CLI_API_CLIENT_H
+#define VELT_CLI_API_CLIENT_H
+
+#include "cli/http_client.h"
+
+#include <json/value.h>
+
+namespace velt::cli {
+
+/// One method of one version of a web API.
+struct ApiMethod {
+    std::string api;
+    int version = 1;
+    std::string method;
+};
+
+inline constexpr const char* ftpApi = "VELT.Core.FileServ.FTP";
+inline constexpr const char* securityApi = "VELT.Core.FileServ.FTP.Security";
+inline constexpr const char* chrootApi = "VELT.Core.FileServ.FTP.ChrootUser";
+inline constexpr const char* sftpApi = "VELT.Core.FileServ.FTP.SFTP";
+
+class ApiClient {
+public:
+    explicit ApiClient(Endpoint endpoint) : http_(std::move(endpoint)) {}
+
+    /// A method that takes no parameters and changes nothing.
+    Json::Value read(const ApiMethod& method);
+
+    /// Any method with its parameters. Null when the method answers without a value.
+    Json::Value call(const ApiMethod& method, const Json::Value& parameters);
+
+    /// The endpoints beside the methods; `path` starts with a slash.
+    Json::Value get(const std::string& path);
+    Json::Value post(const std::string& path, const Json::Value& body);
+    void remove(const std::string& path);
+
+    /// As HttpClient::follow; an answer other than 200 is thrown.
+    void follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
+                const std::function<bool()>& stop);
+
+    const Endpoint& endpoint() const { return http_.endpoint(); }
+
+private:
+    Json::Value exchange(const std::string& method, const std::string& path,
+                         const std::optional<std::string>& body);
+
+    HttpClient http_;
+};
+
+} // namespace velt::cli
+
+#endif

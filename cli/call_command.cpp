@@ -1,0 +1,77 @@
+#include "cli/failure.h"
+#include "cli/json_text.h"
+#include "cli/session.h"
+#include "cli/table.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+
+namespace velt::cli {
+
+namespace {
+
+struct CallOptions {
+    bool list = false;
+    ApiMethod method{"", 0, ""};
+    std::string parameters = "{}";
+};
+
+void listMethods(Session& session) {
+    const Json::Value answer = session.api.get("/api");
+    if (session.json) {
+        writeJson(session.console.out, answer);
+        return;
+    }
+    Table table({"API", "VERSION", "METHOD", "CHANGES"});
+    for (const Json::Value& row : answer["rows"]) {
+        table.add({textAt(row, "api"), textAt(row, "version"), textAt(row, "method"),
+                   row["read"] == true ? "no" : "yes"});
+    }
+    table.write(session.console.out);
+}
+
+void callMethod(Session& session, const CallOptions& options) {
+    if (options.list) {
+        listMethods(session);
+        return;
+    }
+    if (options.method.method.empty()) {
+        throw Failure(ExitCode::usage, "call needs API, VERSION and METHOD.",
+                      "'veltctl call --list' shows what the server can do.");
+    }
+    const std::string text = options.parameters == "-" ? readInput(session.console, "-") : options.parameters;
+    std::string problem;
+    const std::optional<Json::Value> parameters = parseJson(text, problem);
+    if (!parameters || !parameters->isObject()) {
+        Failure failure(ExitCode::usage, "The parameters are no JSON object.",
+                        "Give an object such as '{\"enable_ftp\": true}', in quotes for the shell.");
+        if (!problem.empty()) {
+            failure.note(problem);
+        }
+        throw Failure(failure);
+    }
+    const Json::Value answer = session.api.call(options.method, *parameters);
+    if (!answer.isNull()) {
+        writeJson(session.console.out, answer);
+    }
+}
+
+} // namespace
+
+void addCallCommand(CLI::App& app, Command& chosen) {
+    auto options = std::make_shared<CallOptions>();
+    CLI::App* call = app.add_subcommand("call", "Call any method of any API and show its answer as JSON");
+    call->add_flag("--list", options->list, "List the methods that the server has");
+    call->add_option("api", options->method.api, "Name of the API")->type_name("");
+    call->add_option("version", options->method.version, "Version of the API")
+        ->check(CLI::PositiveNumber)
+        ->type_name("");
+    call->add_option("method", options->method.method, "Name of the method")->type_name("");
+    call->add_option("parameters", options->parameters, "A JSON object, or - for the standard input")
+        ->type_name("");
+    call->callback(
+        [&chosen, options] { chosen = [options](Session& session) { callMethod(session, *options); }; });
+}
+
+} // namespace velt::cli

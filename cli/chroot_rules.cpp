@@ -1,0 +1,102 @@
+#include "cli/chroot_rules.h"
+
+#include "cli/failure.h"
+#include "cli/json_text.h"
+
+#include <algorithm>
+
+namespace velt::cli {
+
+namespace {
+
+const ApiMethod loadMethod{chrootApi, 2, "load"};
+const ApiMethod saveMethod{chrootApi, 2, "save"};
+
+ChrootRule ruleFromJson(const Json::Value& object) {
+    return {textAt(object, "type"), textAt(object, "name"), textAt(object, "path")};
+}
+
+// The server takes any text that is not "user" for a group, and trips over an empty path when it loads the rules again.
+std::string faultOf(const Json::Value& object) {
+    if (!object.isObject() || !object["type"].isString() || !object["name"].isString() ||
+        !object["path"].isString()) {
+        return "an object with the texts type, name and path is expected";
+    }
+    const ChrootRule rule = ruleFromJson(object);
+    if (rule.type != "user" && rule.type != "group") {
+        return "type: expected user or group";
+    }
+    if (rule.name.empty()) {
+        return "name: expected the name of a user or group";
+    }
+    return rule.path.empty() || rule.path.front() != '/' ? "path: expected /home, /SHARE or /SHARE/FOLDER"
+                                                         : "";
+}
+
+} // namespace
+
+std::string ruleToText(const ChrootRule& rule) {
+    return rule.type + " " + rule.name + " " + rule.path;
+}
+
+Json::Value rulesToJson(const ChrootRules& rules) {
+    Json::Value array(Json::arrayValue);
+    for (const ChrootRule& rule : rules) {
+        Json::Value object;
+        object["type"] = rule.type;
+        object["name"] = rule.name;
+        object["path"] = rule.path;
+        array.append(object);
+    }
+    return array;
+}
+
+ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults) {
+    ChrootRules rules;
+    if (!array.isArray()) {
+        faults.emplace_back("rules: an array is expected");
+        return rules;
+    }
+    for (Json::ArrayIndex i = 0; i < array.size(); ++i) {
+        if (const std::string fault = faultOf(array[i]); !fault.empty()) {
+            faults.push_back("rule " + std::to_string(i + 1) + ": " + fault);
+            continue;
+        }
+        rules.push_back(ruleFromJson(array[i]));
+    }
+    return rules;
+}
+
+ChrootRules loadRules(ApiClient& api) {
+    const Json::Value answer = api.read(loadMethod);
+    ChrootRules rules;
+    if (!answer.isObject() || !answer["rules"].isArray()) {
+        throw Failure(ExitCode::platform, "The server's answer holds no chroot rules.",
+                      "Check with 'veltctl status' that the server is of the same release as veltctl.");
+    }
+    for (const Json::Value& rule : answer["rules"]) {
+        rules.push_back(ruleFromJson(rule));
+    }
+    return rules;
+}
+
+void saveRules(ApiClient& api, const ChrootRules& rules) {
+    Json::Value parameters;
+    parameters["rules"] = rulesToJson(rules);
+    api.call(saveMethod, parameters);
+
+    const ChrootRules stored = loadRules(api);
+    Failure dropped(ExitCode::refused,
+                    "Some rules were left out: the server does not know their user or group.",
+                    "Correct these names and save again; the other rules are stored.");
+    for (const ChrootRule& rule : rules) {
+        if (std::find(stored.begin(), stored.end(), rule) == stored.end()) {
+            dropped.note("left out: " + ruleToText(rule));
+        }
+    }
+    if (!dropped.notes().empty()) {
+        throw Failure(dropped);
+    }
+}
+
+} // namespace velt::cli

@@ -1,0 +1,40 @@
+// Chroot rules: who is confined to which directory over FTP.
+#ifndef VELT_CLI_CHROOT_RULES_H
+#define VELT_CLI_CHROOT_RULES_H
+
+#include "cli/api_client.h"
+
+#include <string>
+#include <vector>
+
+namespace velt::cli {
+
+struct ChrootRule {
+    std::string type; ///< "user" or "group"
+    std::string name;
+    std::string path; ///< "/share", "/share/folder" or "/home"
+
+    bool operator==(const ChrootRule&) const = default;
+};
+
+using ChrootRules = std::vector<ChrootRule>;
+
+/// As "user NAME PATH".
+std::string ruleToText(const ChrootRule& rule);
+
+Json::Value rulesToJson(const ChrootRules& rules);
+
+/// The rules of an array of objects; other keys than "type", "name" and "path" are passed over. Each fault of the array is
+/// added to `faults`, in words.
+ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults);
+
+/// What the server has stored.
+ChrootRules loadRules(ApiClient& api);
+
+/// Stores the rules in place of all stored ones, and loads them again: the server leaves out rules whose user or group it
+/// does not know. Throws Failure (refused) that names them.
+void saveRules(ApiClient& api, const ChrootRules& rules);
+
+} // namespace velt::cli
+
+#endif

@@ -1,0 +1,121 @@
+# Completion of veltctl for bash. Works with and without the bash-completion package.
+
+# The words that may follow a command; nothing for a command that takes words of the user's own.
+_veltctl_words() {
+    local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
+        enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
+    case $1 in
+        '') echo 'status log events ftp security sftp shares chroot tokens export import call' ;;
+        ftp | security | sftp) echo 'get set' ;;
+        'ftp set') echo "$ftp utf8_mode= enable_utf8= use_utf8=" ;;
+        'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
+        'sftp set') echo 'enable= portnum=' ;;
+        chroot) echo 'users rules' ;;
+        'chroot users') echo 'list add delete' ;;
+        'chroot rules') echo 'load save add remove' ;;
+        'chroot rules add' | 'chroot rules remove') echo 'user group' ;;
+        tokens) echo 'list create delete' ;;
+    esac
+}
+
+# The options of a command, beside those that every command has.
+_veltctl_options() {
+    echo '--help --json --url --socket --token-file --ca-file --timeout'
+    case $1 in
+        '') echo '--version' ;;
+        log) echo '--since --event --actor --before --limit --all' ;;
+        events) echo '--count' ;;
+        'ftp get' | 'ftp set') echo '--api-version' ;;
+        'chroot users list') echo '--others --offset --limit --type --domain --filter' ;;
+        'tokens create') echo '--role' ;;
+        export) echo '--output' ;;
+        import) echo '--dry-run' ;;
+        call) echo '--list' ;;
+    esac
+}
+
+# Whether the option takes the word behind it.
+_veltctl_takes_word() {
+    case $1 in
+        --url | --socket | --token-file | --ca-file | --timeout | --since | --event | --actor | --before | --limit | \
+            --count | --api-version | --offset | --type | --domain | --filter | --role | --output | -o) return 0 ;;
+    esac
+    return 1
+}
+
+# Sets COMPREPLY to the value of an option. False when it is one that cannot be known.
+_veltctl_option_value() {
+    case $1 in
+        --type) COMPREPLY=($(compgen -W 'local domain ldap all' -- "$2")) ;;
+        --role) COMPREPLY=($(compgen -W 'admin viewer' -- "$2")) ;;
+        --api-version) COMPREPLY=($(compgen -W '1 2 3' -- "$2")) ;;
+        --socket | --token-file | --ca-file | --output | -o) _veltctl_files "$2" ;;
+    esac
+}
+
+_veltctl_files() {
+    compopt -o filenames 2>/dev/null
+    mapfile -t COMPREPLY < <(compgen -f -- "$1")
+}
+
+# The value of a setting: those that are on or off have names that tell so, or are listed here.
+_veltctl_setting_value() {
+    case $1 in
+        enable | enable_* | use_* | custom_port_range | user_chroot | anonymous | anonymous_chroot)
+            COMPREPLY=($(compgen -W 'on off' -- "$2")) ;;
+        utf8_mode) COMPREPLY=($(compgen -W '0 1 2' -- "$2")) ;;
+    esac
+}
+
+# The command so far, without options and their values, into the variable `command`.
+_veltctl_command() {
+    local i word
+    command=
+    for ((i = 1; i < COMP_CWORD; i++)); do
+        word=${COMP_WORDS[i]}
+        if _veltctl_takes_word "$word"; then
+            ((i++))
+            [ "${COMP_WORDS[i]}" != '=' ] || ((i++)) # --url=... stands as three words
+        elif [[ $word != -* ]]; then
+            # Only words that lead on belong to the command; the rest are its arguments.
+            [[ " $(_veltctl_words "$command" | tr '\n' ' ') " == *" $word "* ]] || break
+            command=${command:+$command }$word
+        fi
+    done
+}
+
+_veltctl() {
+    local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command
+    COMPREPLY=()
+    # The shell takes "=" for a word of its own: key=value is three words.
+    if [ "$current" = '=' ]; then
+        current=
+        previous='='
+        local key=${COMP_WORDS[COMP_CWORD - 1]}
+    else
+        local key=${COMP_WORDS[COMP_CWORD - 2]:-}
+    fi
+    if [ "$previous" = '=' ]; then
+        case $key in
+            --*) _veltctl_option_value "$key" "$current" ;;
+            *) _veltctl_setting_value "$key" "$current" ;;
+        esac
+        return
+    fi
+    if _veltctl_takes_word "$previous"; then
+        _veltctl_option_value "$previous" "$current"
+        return
+    fi
+    _veltctl_command
+    if [[ $current == -* ]]; then
+        COMPREPLY=($(compgen -W "$(_veltctl_options "$command")" -- "$current"))
+        return
+    fi
+    case $command in
+        import | 'chroot rules save') _veltctl_files "$current" ;;
+        *) COMPREPLY=($(compgen -W "$(_veltctl_words "$command")" -- "$current")) ;;
+    esac
+    [[ ${COMPREPLY[*]:-} != *= ]] || compopt -o nospace 2>/dev/null
+}
+
+complete -F _veltctl veltctl

@@ -1,0 +1,88 @@
+#include "cli/endpoint.h"
+
+#include "cli/failure.h"
+
+#include <algorithm>
+#include <cctype>
+
+namespace velt::cli {
+
+namespace {
+
+std::string hostOf(const std::string& url) {
+    const std::size_t start = url.find("://") + 3;
+    std::string authority = url.substr(start, url.find_first_of("/?#", start) - start);
+    authority.erase(0, authority.rfind('@') + 1);
+    if (!authority.empty() && authority.front() == '[') {
+        return authority.substr(0, authority.find(']') + 1);
+    }
+    return authority.substr(0, authority.find(':'));
+}
+
+// Digits only after "127.": a name such as 127.example.org is another machine.
+bool isLoopback(const std::string& host) {
+    return host == "localhost" || host == "[::1]" ||
+           (host.rfind("127.", 0) == 0 && host.find_first_not_of("0123456789.") == std::string::npos);
+}
+
+void checkUrl(const std::string& url) {
+    const bool known = url.rfind("http://", 0) == 0 || url.rfind("https://", 0) == 0;
+    if (!known || hostOf(url).empty()) {
+        throw Failure(ExitCode::usage, "\"" + url + "\" is no address of a server.",
+                      "Give an address such as http://127.0.0.1:8443 or https://server:8443.");
+    }
+}
+
+std::string readToken(const EndpointOptions& options, Console& console) {
+    if (options.tokenFile.empty()) {
+        return console.environment("VELT_TOKEN").value_or("");
+    }
+    std::string token = readInput(console, options.tokenFile);
+    while (!token.empty() && std::isspace(static_cast<unsigned char>(token.back())) != 0) {
+        token.pop_back();
+    }
+    return token;
+}
+
+// A line end in the token would start a header of its own.
+void checkToken(const Endpoint& endpoint) {
+    const std::string& token = endpoint.token;
+    if (std::any_of(token.begin(), token.end(), [](unsigned char c) { return c <= 0x20 || c >= 0x7F; })) {
+        throw Failure(ExitCode::usage, "The token holds characters that no token has.",
+                      "Copy the token again; it is one word.");
+    }
+    const bool encrypted = endpoint.url.rfind("https://", 0) == 0;
+    if (!token.empty() && endpoint.socket.empty() && !encrypted && !isLoopback(hostOf(endpoint.url))) {
+        throw Failure(ExitCode::usage, "The token would travel unencrypted to " + hostOf(endpoint.url) + ".",
+                      "Use an https:// address, or run veltctl on the server itself.");
+    }
+}
+
+} // namespace
+
+Endpoint findEndpoint(const EndpointOptions& options, Console& console) {
+    Endpoint endpoint;
+    endpoint.url = options.url;
+    endpoint.socket = options.socket;
+    if (endpoint.url.empty() && endpoint.socket.empty()) {
+        endpoint.url = console.environment("VELT_URL").value_or("");
+    }
+    if (endpoint.url.empty()) {
+        if (endpoint.socket.empty()) {
+            endpoint.socket = console.environment("VELT_SOCKET").value_or("");
+        }
+        if (endpoint.socket.empty()) {
+            endpoint.socket = defaultSocket;
+        }
+        endpoint.url = "http://localhost";
+    }
+    checkUrl(endpoint.url);
+    endpoint.url.erase(endpoint.url.find_last_not_of('/') + 1);
+    endpoint.token = readToken(options, console);
+    endpoint.caFile = options.caFile;
+    endpoint.timeoutSeconds = options.timeoutSeconds;
+    checkToken(endpoint);
+    return endpoint;
+}
+
+} // namespace velt::cli

@@ -1,0 +1,40 @@
+// Where the server is, and with what right it is asked.
+#ifndef VELT_CLI_ENDPOINT_H
+#define VELT_CLI_ENDPOINT_H
+
+#include "cli/console.h"
+
+#include <string>
+
+namespace velt::cli {
+
+inline constexpr const char* defaultSocket = "/run/velt/veltd.sock";
+inline constexpr int defaultTimeoutSeconds = 60;
+
+/// What the command line says about the server. Empty texts: not given.
+struct EndpointOptions {
+    std::string url;
+    std::string socket;
+    std::string tokenFile;
+    std::string caFile;
+    int timeoutSeconds = defaultTimeoutSeconds;
+};
+
+struct Endpoint {
+    std::string url;    ///< scheme, host and port, without a slash at the end
+    std::string socket; ///< path of a Unix socket; empty for TCP
+    std::string token;  ///< bearer token; empty for none
+    std::string caFile; ///< certificates to trust; empty for the system's
+    int timeoutSeconds = defaultTimeoutSeconds;
+
+    /// As people would name it.
+    std::string name() const { return socket.empty() ? url : socket; }
+};
+
+/// The options first, then VELT_URL, VELT_SOCKET and VELT_TOKEN, then the default socket. Throws Failure (usage) for an
+/// address that is no http or https URL, and for a token that would travel unencrypted to another machine.
+Endpoint findEndpoint(const EndpointOptions& options, Console& console);
+
+} // namespace velt::cli
+
+#endif

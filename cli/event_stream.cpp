@@ -1,0 +1,44 @@
+#include "cli/event_stream.h"
+
+namespace velt::cli {
+
+void EventStream::feed(std::string_view piece) {
+    for (const char c : piece) {
+        if (c != '\n') {
+            line_ += c;
+            continue;
+        }
+        if (!line_.empty() && line_.back() == '\r') {
+            line_.pop_back();
+        }
+        takeLine(line_);
+        line_.clear();
+    }
+}
+
+void EventStream::takeLine(std::string_view line) {
+    if (line.empty()) {
+        if (hasData_) {
+            handler_(event_.empty() ? "message" : event_, data_);
+        }
+        event_.clear();
+        data_.clear();
+        hasData_ = false;
+        return;
+    }
+    const std::size_t colon = line.find(':'); // first of a line: a comment, such as a heartbeat
+    const std::string_view field = line.substr(0, colon);
+    std::string_view value = colon == std::string_view::npos ? std::string_view() : line.substr(colon + 1);
+    if (!value.empty() && value.front() == ' ') {
+        value.remove_prefix(1);
+    }
+    if (field == "event") {
+        event_ = value;
+    } else if (field == "data") {
+        data_ += hasData_ ? "\n" : "";
+        data_ += value;
+        hasData_ = true;
+    }
+}
+
+} // namespace velt::cli

@@ -1,0 +1,228 @@
+#include "cli/http_client.h"
+
+#include "cli/failure.h"
+
+#include <curl/curl.h>
+
+#include <cerrno>
+#include <cstring>
+#include <new>
+
+namespace velt::cli {
+
+namespace {
+
+constexpr std::size_t largestAnswer = std::size_t{64} * 1024 * 1024;
+constexpr long connectSeconds = 10;
+
+// What the callbacks of one transfer share. An exception must not pass through the C library.
+struct Transfer {
+    CURL* curl = nullptr;
+    HttpAnswer answer;
+    bool stopped = false;
+    const std::function<bool(std::string_view)>* onText = nullptr;
+    const std::function<bool()>* stop = nullptr;
+    std::exception_ptr exception;
+};
+
+bool receive(Transfer& transfer, std::string_view text) {
+    curl_easy_getinfo(transfer.curl, CURLINFO_RESPONSE_CODE, &transfer.answer.status);
+    if (transfer.onText != nullptr && transfer.answer.status == 200) {
+        transfer.stopped = !(*transfer.onText)(text);
+        return !transfer.stopped;
+    }
+    if (transfer.answer.body.size() + text.size() > largestAnswer) {
+        throw Failure(ExitCode::access, "The answer is larger than any that the server gives.",
+                      "Check that the address is that of veltd.");
+    }
+    transfer.answer.body.append(text);
+    return true;
+}
+
+std::size_t onData(char* data, std::size_t, std::size_t size, void* context) noexcept {
+    auto& transfer = *static_cast<Transfer*>(context);
+    try {
+        return receive(transfer, {data, size}) ? size : 0;
+    } catch (...) {
+        transfer.exception = std::current_exception();
+        return 0;
+    }
+}
+
+int onProgress(void* context, curl_off_t, curl_off_t, curl_off_t, curl_off_t) noexcept {
+    auto& transfer = *static_cast<Transfer*>(context);
+    try {
+        transfer.stopped = transfer.stopped || (transfer.stop != nullptr && (*transfer.stop)());
+    } catch (...) {
+        transfer.exception = std::current_exception();
+        return 1;
+    }
+    return transfer.stopped ? 1 : 0;
+}
+
+void initialiseLibrary() {
+    struct Library {
+        Library() { curl_global_init(CURL_GLOBAL_DEFAULT); }
+        ~Library() { curl_global_cleanup(); }
+        Library(const Library&) = delete;
+        Library& operator=(const Library&) = delete;
+    };
+    static const Library library;
+}
+
+std::string hintFor(const Endpoint& endpoint, CURLcode code, long systemError) {
+    if (code == CURLE_OPERATION_TIMEDOUT) {
+        return "The request may still take effect: look with 'veltctl status', or wait longer with "
+               "--timeout.";
+    }
+    if (code == CURLE_PEER_FAILED_VERIFICATION || code == CURLE_SSL_CACERT_BADFILE) {
+        return "Name the certificate that signed the server's with --ca-file.";
+    }
+    if (endpoint.socket.empty()) {
+        return "Check the address (--url, VELT_URL) and that veltd listens there.";
+    }
+    if (systemError == EACCES || systemError == EPERM) {
+        return "Run veltctl as root or as a member of the group velt-admin.";
+    }
+    return "Start veltd, or name its socket with --socket or VELT_SOCKET, or its address with --url or "
+           "VELT_URL.";
+}
+
+Failure noAnswer(const Endpoint& endpoint, CURL* curl, CURLcode code, const char* reason) {
+    long systemError = 0;
+    curl_easy_getinfo(curl, CURLINFO_OS_ERRNO, &systemError);
+    Failure failure(ExitCode::access, "No answer from " + endpoint.name() + ".",
+                    hintFor(endpoint, code, systemError));
+    const bool connecting = code == CURLE_COULDNT_CONNECT && systemError != 0;
+    failure.note(connecting ? std::strerror(static_cast<int>(systemError))
+                            : (*reason != '\0' ? reason : curl_easy_strerror(code)));
+    return failure;
+}
+
+} // namespace
+
+struct HttpClient::Handle {
+    CURL* curl = curl_easy_init();
+    curl_slist* headers = nullptr;
+    Transfer transfer;
+    char reason[CURL_ERROR_SIZE] = {};
+
+    Handle() = default;
+    ~Handle() {
+        curl_slist_free_all(headers);
+        curl_easy_cleanup(curl);
+    }
+    Handle(const Handle&) = delete;
+    Handle& operator=(const Handle&) = delete;
+
+    void addHeader(const std::string& line) {
+        curl_slist* longer = curl_slist_append(headers, line.c_str());
+        if (longer == nullptr) {
+            throw std::bad_alloc();
+        }
+        headers = longer;
+    }
+};
+
+HttpClient::HttpClient(Endpoint endpoint) : endpoint_(std::move(endpoint)) {
+    initialiseLibrary();
+    handle_ = std::make_unique<Handle>();
+    if (handle_->curl == nullptr) {
+        throw std::bad_alloc();
+    }
+}
+
+HttpClient::~HttpClient() = default;
+
+void HttpClient::prepare(const std::string& path) {
+    CURL* curl = handle_->curl;
+    curl_easy_reset(curl); // keeps the connection
+    curl_slist_free_all(handle_->headers);
+    handle_->headers = nullptr;
+    handle_->transfer = Transfer{};
+    handle_->transfer.curl = curl;
+    handle_->reason[0] = '\0';
+
+    curl_easy_setopt(curl, CURLOPT_URL, (endpoint_.url + path).c_str());
+    curl_easy_setopt(curl, CURLOPT_PROTOCOLS_STR, "http,https");
+    // A proxy from the environment would see the token, and a proxy cannot reach the loopback of this machine.
+    curl_easy_setopt(curl, CURLOPT_PROXY, "");
+    curl_easy_setopt(curl, CURLOPT_NOSIGNAL, 1L);
+    curl_easy_setopt(curl, CURLOPT_ERRORBUFFER, handle_->reason);
+    curl_easy_setopt(curl, CURLOPT_CONNECTTIMEOUT, connectSeconds);
+    curl_easy_setopt(curl, CURLOPT_WRITEFUNCTION, &onData);
+    curl_easy_setopt(curl, CURLOPT_WRITEDATA, &handle_->transfer);
+    if (!endpoint_.socket.empty()) {
+        curl_easy_setopt(curl, CURLOPT_UNIX_SOCKET_PATH, endpoint_.socket.c_str());
+    }
+    if (!endpoint_.caFile.empty()) {
+        curl_easy_setopt(curl, CURLOPT_CAINFO, endpoint_.caFile.c_str());
+    }
+    if (!endpoint_.token.empty()) {
+        handle_->addHeader("Authorization: Bearer " + endpoint_.token);
+    }
+    handle_->addHeader("Expect:"); // a second round trip for nothing
+}
+
+void HttpClient::perform(bool mayBeStopped) {
+    CURL* curl = handle_->curl;
+    Transfer& transfer = handle_->transfer;
+    curl_easy_setopt(curl, CURLOPT_HTTPHEADER, handle_->headers);
+    const CURLcode code = curl_easy_perform(curl);
+    if (transfer.exception) {
+        std::rethrow_exception(transfer.exception);
+    }
+    if (code != CURLE_OK && !(mayBeStopped && transfer.stopped)) {
+        throw noAnswer(endpoint_, curl, code, handle_->reason);
+    }
+    curl_easy_getinfo(curl, CURLINFO_RESPONSE_CODE, &transfer.answer.status);
+}
+
+HttpAnswer HttpClient::send(const std::string& method, const std::string& path,
+                            const std::optional<std::string>& body) {
+    prepare(path);
+    CURL* curl = handle_->curl;
+    curl_easy_setopt(curl, CURLOPT_TIMEOUT, static_cast<long>(endpoint_.timeoutSeconds));
+    handle_->addHeader("Accept: application/json, application/problem+json");
+    if (body) {
+        handle_->addHeader("Content-Type: application/json");
+        curl_easy_setopt(curl, CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body->size()));
+        curl_easy_setopt(curl, CURLOPT_POSTFIELDS, body->c_str());
+    }
+    if (method != "GET") {
+        curl_easy_setopt(curl, CURLOPT_CUSTOMREQUEST, method.c_str());
+    }
+    perform(false);
+    return handle_->transfer.answer;
+}
+
+HttpAnswer HttpClient::follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
+                              const std::function<bool()>& stop) {
+    prepare(path);
+    CURL* curl = handle_->curl;
+    handle_->addHeader("Accept: text/event-stream");
+    handle_->transfer.onText = &onText;
+    handle_->transfer.stop = &stop;
+    curl_easy_setopt(curl, CURLOPT_NOPROGRESS, 0L);
+    curl_easy_setopt(curl, CURLOPT_XFERINFOFUNCTION, &onProgress);
+    curl_easy_setopt(curl, CURLOPT_XFERINFODATA, &handle_->transfer);
+    perform(true);
+    return handle_->transfer.answer;
+}
+
+std::string percentEncode(const std::string& text) {
+    static const char* const digits = "0123456789ABCDEF";
+    static const std::string plain = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
+    std::string result;
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        if (plain.find(c) != std::string::npos) {
+            result += c;
+        } else {
+            result += {'%', digits[byte >> 4U], digits[byte & 0x0FU]};
+        }
+    }
+    return result;
+}
+
+} // namespace velt::cli

@@ -1,0 +1,55 @@
+// HTTP over TCP or a Unix socket, one request after the other on one connection.
+#ifndef VELT_CLI_HTTP_CLIENT_H
+#define VELT_CLI_HTTP_CLIENT_H
+
+#include "cli/endpoint.h"
+
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace velt::cli {
+
+struct HttpAnswer {
+    long status = 0;
+    std::string body;
+};
+
+/// Not for use by several threads at once.
+class HttpClient {
+public:
+    explicit HttpClient(Endpoint endpoint);
+    ~HttpClient();
+    HttpClient(const HttpClient&) = delete;
+    HttpClient& operator=(const HttpClient&) = delete;
+
+    const Endpoint& endpoint() const { return endpoint_; }
+
+    /// Sends one request; `path` starts with a slash and is encoded already, `body` is JSON. Any status is an answer.
+    /// Throws Failure (access) when there is none.
+    HttpAnswer send(const std::string& method, const std::string& path,
+                    const std::optional<std::string>& body);
+
+    /// Hands what a GET of `path` delivers to `onText`, until the server ends it, `onText` returns false or `stop`
+    /// returns true (asked once a second at least). The body of an answer other than 200 is returned instead.
+    HttpAnswer follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
+                      const std::function<bool()>& stop);
+
+private:
+    struct Handle;
+
+    void prepare(const std::string& path);
+    void perform(bool mayBeStopped);
+
+    Endpoint endpoint_;
+    std::unique_ptr<Handle> handle_;
+};
+
+/// A text as one segment of a path or one value of a query.
+std::string percentEncode(const std::string& text);
+
+} // namespace velt::cli
+
+#endif

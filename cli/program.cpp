@@ -1,0 +1,140 @@
+#include "cli/program.h"
+
+#include "cli/failure.h"
+#include "cli/session.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <ostream>
+
+namespace velt::cli {
+
+namespace {
+
+constexpr const char* exitCodes =
+    "Exit codes: 0 done, 1 local file, 2 usage, 3 input refused, 4 conflict, 5 the server failed, "
+    "6 no connection or access.";
+
+struct GlobalOptions {
+    EndpointOptions endpoint;
+    bool json = false;
+};
+
+void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
+    app.add_flag("--json", options.json, "Write JSON, for programs");
+    CLI::Option* url = app.add_option("--url", options.endpoint.url, "Address of the server (or VELT_URL)")
+                           ->type_name("URL");
+    app.add_option("--socket", options.endpoint.socket,
+                   std::string("Unix socket of the server (or VELT_SOCKET, default ") + defaultSocket + ")")
+        ->type_name("PATH")
+        ->excludes(url);
+    app.add_option("--token-file", options.endpoint.tokenFile,
+                   "File with the token (or the token in VELT_TOKEN)")
+        ->type_name("FILE");
+    app.add_option("--ca-file", options.endpoint.caFile, "Certificates to trust for https")
+        ->type_name("FILE");
+    app.add_option("--timeout", options.endpoint.timeoutSeconds, "Seconds to wait for an answer (default 60)")
+        ->check(CLI::Range(1, 86400))
+        ->type_name("SECONDS");
+}
+
+void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
+    app.fallthrough(); // options may stand behind the command
+    app.require_subcommand(1);
+    app.set_version_flag("--version", VELT_VERSION);
+    app.footer(exitCodes);
+    addGlobalOptions(app, options);
+    addStatusCommands(app, chosen);
+    addSettingsCommands(app, chosen);
+    addShareCommands(app, chosen);
+    addChrootCommands(app, chosen);
+    addTokenCommands(app, chosen);
+    addDocumentCommands(app, chosen);
+    addCallCommand(app, chosen);
+}
+
+// Which command was meant, for the hint.
+std::string chosenWords(const CLI::App& app) {
+    std::string words = "veltctl";
+    for (const CLI::App* at = &app; !at->get_subcommands().empty();) {
+        at = at->get_subcommands().front();
+        words += " " + at->get_name();
+    }
+    return words;
+}
+
+ExitCode endOfParsing(const CLI::App& app, const CLI::ParseError& error, Console& console) {
+    if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
+        app.exit(error, console.out, console.err); // help or version
+        return ExitCode::done;
+    }
+    std::string message = error.what();
+    message.erase(message.find_last_not_of('\n') + 1);
+    writeFailure(console.err, Failure(ExitCode::usage, message + ".",
+                                      "'" + chosenWords(app) + " --help' explains the words."));
+    return ExitCode::usage;
+}
+
+void runCommand(const Command& command, const GlobalOptions& options, Console& console) {
+    ApiClient api(findEndpoint(options.endpoint, console));
+    Session session{console, api, options.json};
+    try {
+        command(session);
+    } catch (const Json::Exception&) {
+        throw Failure(ExitCode::platform, "The server's answer has a form that veltctl does not know.",
+                      "Check that the server is of the same release as veltctl.");
+    }
+    console.out.flush();
+    if (!console.out) {
+        throw Failure(ExitCode::local, "The output cannot be written.",
+                      "Check where it goes, and the space there.");
+    }
+}
+
+void describeBelow(const CLI::App& app, const std::string& words, std::vector<CommandDescription>& found) {
+    const auto below = app.get_subcommands([](const CLI::App*) { return true; });
+    CommandDescription description{words, {}};
+    for (const CLI::Option* option : app.get_options()) {
+        for (const std::string& name : option->get_lnames()) {
+            description.options.push_back("--" + name);
+        }
+    }
+    found.push_back(description);
+    for (const CLI::App* child : below) {
+        describeBelow(*child, words.empty() ? child->get_name() : words + " " + child->get_name(), found);
+    }
+}
+
+} // namespace
+
+ExitCode runProgram(const std::vector<std::string>& words, Console& console) {
+    CLI::App app("Administers the file-transfer services of a server", "veltctl");
+    GlobalOptions options;
+    Command command;
+    addCommands(app, options, command);
+    std::vector<std::string> reversed(words.rbegin(), words.rend()); // the parser takes the last word first
+    try {
+        app.parse(std::move(reversed));
+        runCommand(command, options, console);
+    } catch (const CLI::ParseError& error) {
+        return endOfParsing(app, error, console);
+    } catch (const Failure& failure) {
+        console.out.flush();
+        writeFailure(console.err, failure);
+        return failure.code();
+    }
+    return ExitCode::done;
+}
+
+std::vector<CommandDescription> describeCommands() {
+    CLI::App app("", "veltctl");
+    GlobalOptions options;
+    Command command;
+    addCommands(app, options, command);
+    std::vector<CommandDescription> found;
+    describeBelow(app, "", found);
+    return found;
+}
+
+} // namespace velt::cli

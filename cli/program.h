@@ -1,0 +1,26 @@
+// The whole of veltctl, apart from the process it runs in.
+#ifndef VELT_CLI_PROGRAM_H
+#define VELT_CLI_PROGRAM_H
+
+#include "cli/console.h"
+#include "cli/exit_code.h"
+
+#include <string>
+#include <vector>
+
+namespace velt::cli {
+
+/// Runs the command that the words (without the program's name) name. Results go to the console's output, everything that
+/// went wrong to its error output.
+ExitCode runProgram(const std::vector<std::string>& words, Console& console);
+
+/// Every command as its words ("chroot rules add"), and every option of each ("--json"), for tests of what describes them.
+struct CommandDescription {
+    std::string words;
+    std::vector<std::string> options;
+};
+std::vector<CommandDescription> describeCommands();
+
+} // namespace velt::cli
+
+#endif

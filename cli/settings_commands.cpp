@@ -1,0 +1,171 @@
+#include "cli/settings_commands.h"
+
+#include "cli/failure.h"
+#include "cli/json_text.h"
+#include "cli/table.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <memory>
+
+namespace velt::cli {
+
+namespace {
+
+std::vector<Change> differences(const SettingGroup& group, const Json::Value& before,
+                                const Json::Value& after) {
+    std::vector<Change> changes;
+    for (const Setting& setting : group.settings) {
+        if (before[setting.key] != after[setting.key]) {
+            changes.push_back({setting.key, before[setting.key], after[setting.key]});
+        }
+    }
+    return changes;
+}
+
+// Some values are accepted and passed over, such as a UTF-8 switch without UTF-8 support.
+void warnOfKeptValues(Session& session, const Json::Value& wanted, const Json::Value& after) {
+    for (const std::string& key : wanted.getMemberNames()) {
+        if (after[key] != wanted[key]) {
+            session.console.err << "veltctl: warning: the server accepted " << key << "="
+                                << printable(displayValue(wanted[key])) << ", but shows "
+                                << printable(displayValue(after[key])) << ".\n";
+        }
+    }
+}
+
+void writeChanges(Session& session, const std::vector<Change>& changes, const Json::Value& after) {
+    if (session.json) {
+        Json::Value result;
+        result["changed"] = Json::Value(Json::arrayValue);
+        for (const Change& change : changes) {
+            result["changed"].append(changeToJson(change));
+        }
+        result["settings"] = after;
+        writeJson(session.console.out, result);
+        return;
+    }
+    for (const Change& change : changes) {
+        session.console.out << changeToText(change) << '\n';
+    }
+    if (changes.empty()) {
+        session.console.out << "Nothing changed.\n";
+    }
+}
+
+Json::Value readBack(Session& session, const SettingGroup& group) {
+    try {
+        return readSettings(session.api, group);
+    } catch (Failure& failure) {
+        failure.note("The change itself was accepted; only reading it back failed.");
+        throw;
+    }
+}
+
+struct SettingsOptions {
+    int version = newestFtpVersion;
+    std::vector<std::string> words;
+};
+
+std::string footerOf(const SettingGroup& group) {
+    std::string text = "Settings:\n";
+    for (const Setting& setting : group.settings) {
+        const std::string key = setting.key;
+        text += "  " + key + std::string(key.size() < 24 ? 24 - key.size() : 1, ' ') + setting.meaning +
+                " (" + describe(setting.type) + ")\n";
+    }
+    return text;
+}
+
+void addGroup(CLI::App& app, Command& chosen, const std::string& title,
+              const std::function<SettingGroup(int)>& groupOf) {
+    const SettingGroup group = groupOf(newestFtpVersion);
+    const bool versioned = group.version > 1;
+    auto options = std::make_shared<SettingsOptions>();
+    CLI::App* area = app.add_subcommand(group.command, "Read and change " + title);
+    area->require_subcommand(1);
+    CLI::App* get = area->add_subcommand("get", "Show " + title);
+    CLI::App* set = area->add_subcommand("set", "Change " + title + "; what is not named stays as it is");
+    set->add_option("key=value", options->words, "The settings to change")->required()->type_name("");
+    set->footer(footerOf(group));
+    if (versioned) {
+        for (CLI::App* command : {get, set}) {
+            command
+                ->add_option("--api-version", options->version, "Version of the API: 1, 2 or 3 (default 3)")
+                ->check(CLI::Range(1, newestFtpVersion))
+                ->type_name("N");
+        }
+    }
+    get->callback([&chosen, options, groupOf] {
+        chosen = [options, groupOf](Session& session) { showSettings(session, groupOf(options->version)); };
+    });
+    set->callback([&chosen, options, groupOf] {
+        chosen = [options, groupOf](Session& session) {
+            changeSettings(session, groupOf(options->version), options->words);
+        };
+    });
+}
+
+} // namespace
+
+Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
+    Json::Value current = api.read(group.method("get"));
+    const auto missing = [&](const Setting& setting) {
+        return setting.required && !hasType(current[setting.key], setting.type);
+    };
+    if (!current.isObject() || std::any_of(group.settings.begin(), group.settings.end(), missing)) {
+        throw Failure(ExitCode::platform,
+                      std::string("The server's answer holds no ") + group.command + " settings.",
+                      "Check with 'veltctl status' that the server is of the same release as veltctl.");
+    }
+    return current;
+}
+
+void showSettings(Session& session, const SettingGroup& group) {
+    const Json::Value current = readSettings(session.api, group);
+    if (session.json) {
+        writeJson(session.console.out, current);
+        return;
+    }
+    Table table({"SETTING", "VALUE", "MEANING"});
+    for (const Setting& setting : group.settings) {
+        if (current.isMember(setting.key)) {
+            table.add({setting.key, displayValue(current[setting.key]), setting.meaning});
+        }
+    }
+    table.write(session.console.out);
+}
+
+void changeSettings(Session& session, const SettingGroup& group, const std::vector<std::string>& words) {
+    const Json::Value wanted = parseAssignments(group, words);
+    const Json::Value before = readSettings(session.api, group);
+    session.api.call(group.method("set"), completeChange(group, wanted, before));
+    const Json::Value after = readBack(session, group);
+    writeChanges(session, differences(group, before, after), after);
+    warnOfKeptValues(session, wanted, after);
+}
+
+Json::Value changeToJson(const Change& change) {
+    Json::Value result;
+    result["key"] = change.key;
+    result["from"] = change.from;
+    result["to"] = change.to;
+    return result;
+}
+
+std::string changeToText(const Change& change) {
+    const auto shown = [](const Json::Value& value) {
+        const std::string text = displayValue(value);
+        return text.empty() ? std::string("(empty)") : printable(text);
+    };
+    return change.key + ": " + shown(change.from) + " -> " + shown(change.to);
+}
+
+void addSettingsCommands(CLI::App& app, Command& chosen) {
+    addGroup(app, chosen, "the FTP and FTPS settings", ftpSettings);
+    addGroup(app, chosen, "the security settings of FTP", [](int) { return securitySettings(); });
+    addGroup(app, chosen, "the SFTP settings", [](int) { return sftpSettings(); });
+}
+
+} // namespace velt::cli

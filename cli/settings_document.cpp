@@ -1,0 +1,197 @@
+#include "cli/settings_document.h"
+
+#include "cli/failure.h"
+#include "cli/json_text.h"
+#include "cli/table.h"
+
+#include <algorithm>
+
+namespace velt::cli {
+
+namespace {
+
+constexpr const char* formatName = "velt-settings";
+constexpr int formatVersion = 1;
+constexpr const char* rulesSection = "chroot_rules";
+
+std::vector<SettingGroup> groupsInOrder() {
+    return {securitySettings(), ftpSettings(), sftpSettings()};
+}
+
+// Only what is known: a key of a newer server would make the document one that cannot be imported.
+Json::Value knownSettings(const SettingGroup& group, const Json::Value& current) {
+    Json::Value section(Json::objectValue);
+    for (const Setting& setting : group.settings) {
+        if (current.isMember(setting.key)) {
+            section[setting.key] = current[setting.key];
+        }
+    }
+    return section;
+}
+
+void checkSection(const SettingGroup& group, const Json::Value& section, std::vector<std::string>& faults) {
+    if (!section.isObject()) {
+        faults.push_back(std::string(group.command) + ": an object is expected");
+        return;
+    }
+    for (const std::string& key : section.getMemberNames()) {
+        const std::string name = std::string(group.command) + "." + key;
+        const Setting* setting = group.find(key);
+        if (setting == nullptr) {
+            faults.push_back(name + ": unknown; known are " + group.keys());
+        } else if (!hasType(section[key], setting->type)) {
+            faults.push_back(name + ": expected " + describe(setting->type));
+        }
+    }
+}
+
+void checkTop(const Json::Value& document, std::vector<std::string>& faults) {
+    if (document["format"] != formatName || document["format_version"] != formatVersion) {
+        faults.push_back(std::string("format: expected \"") + formatName + "\" with format_version " +
+                         std::to_string(formatVersion));
+    }
+    static const std::vector<std::string> known = {"format",   "format_version", "ftp",
+                                                   "security", rulesSection,     "sftp"};
+    for (const std::string& name : document.getMemberNames()) {
+        if (std::find(known.begin(), known.end(), name) == known.end()) {
+            faults.push_back(name + ": unknown");
+        }
+    }
+}
+
+// The default passive range is shown beside a switch that is off; it is no setting then.
+void dropIdlePassiveRange(Json::Value& wanted, const Json::Value& section, const Json::Value& current) {
+    const Json::Value& range =
+        section.isMember("custom_port_range") ? section["custom_port_range"] : current["custom_port_range"];
+    if (range != true) {
+        wanted.removeMember("custom_port");
+    } else if (wanted.isMember("custom_port") || wanted.isMember("custom_port_range")) {
+        wanted["custom_port_range"] = true;
+        wanted["custom_port"] =
+            section.isMember("custom_port") ? section["custom_port"] : current["custom_port"];
+    }
+}
+
+void dropEmptyAddress(Json::Value& wanted, const Json::Value& current, std::vector<std::string>& warnings) {
+    if (wanted.isMember("ext_ip") && wanted["ext_ip"].asString().empty()) {
+        warnings.push_back("ftp.ext_ip stays " + displayValue(current["ext_ip"]) +
+                           ": the server takes no empty address; set use_ext_ip to off instead.");
+        wanted.removeMember("ext_ip");
+    }
+}
+
+Json::Value wantedOf(const SettingGroup& group, const Json::Value& section, const Json::Value& current,
+                     std::vector<std::string>& warnings) {
+    Json::Value wanted(Json::objectValue);
+    for (const std::string& key : section.getMemberNames()) {
+        if (section[key] != current[key]) {
+            wanted[key] = section[key];
+        }
+    }
+    if (group.find("custom_port") != nullptr) {
+        dropIdlePassiveRange(wanted, section, current);
+        dropEmptyAddress(wanted, current, warnings);
+    }
+    return wanted;
+}
+
+void planGroup(ApiClient& api, const SettingGroup& group, const Json::Value& section, ImportPlan& plan) {
+    const Json::Value current = readSettings(api, group);
+    const Json::Value wanted = wantedOf(group, section, current, plan.warnings);
+    ImportStep step;
+    step.section = group.command;
+    for (const Setting& setting : group.settings) {
+        if (!wanted.isMember(setting.key) || wanted[setting.key] == current[setting.key]) {
+            continue;
+        }
+        const Change change{setting.key, current[setting.key], wanted[setting.key]};
+        step.changes.push_back(changeToText(change));
+        step.changesJson.append(changeToJson(change));
+    }
+    if (step.changes.empty()) {
+        return;
+    }
+    const Json::Value parameters = completeChange(group, wanted, current);
+    step.apply = [&api, method = group.method("set"), parameters] { api.call(method, parameters); };
+    plan.steps.push_back(std::move(step));
+}
+
+void planRules(ApiClient& api, const Json::Value& array, ImportPlan& plan) {
+    std::vector<std::string> faults;
+    const ChrootRules wanted = rulesFromJson(array, faults);
+    const ChrootRules current = loadRules(api);
+    if (wanted == current) {
+        return;
+    }
+    const auto holds = [](const ChrootRules& rules, const ChrootRule& rule) {
+        return std::find(rules.begin(), rules.end(), rule) != rules.end();
+    };
+    ImportStep step;
+    step.section = rulesSection;
+    for (const ChrootRule& rule : current) {
+        if (!holds(wanted, rule)) {
+            step.changes.push_back("remove " + printable(ruleToText(rule)));
+        }
+    }
+    for (const ChrootRule& rule : wanted) {
+        if (!holds(current, rule)) {
+            step.changes.push_back("add " + printable(ruleToText(rule)));
+        }
+    }
+    if (step.changes.empty()) {
+        step.changes.emplace_back("another order of the same rules");
+    }
+    step.changesJson.append(changeToJson({"rules", rulesToJson(current), rulesToJson(wanted)}));
+    step.apply = [&api, wanted] { saveRules(api, wanted); };
+    plan.steps.push_back(std::move(step));
+}
+
+} // namespace
+
+Json::Value exportSettings(ApiClient& api) {
+    Json::Value document;
+    document["format"] = formatName;
+    document["format_version"] = formatVersion;
+    document[rulesSection] = rulesToJson(loadRules(api));
+    for (const SettingGroup& group : groupsInOrder()) {
+        document[group.command] = knownSettings(group, readSettings(api, group));
+    }
+    return document;
+}
+
+std::vector<std::string> documentFaults(const Json::Value& document) {
+    std::vector<std::string> faults;
+    if (!document.isObject()) {
+        faults.emplace_back("an object is expected");
+        return faults;
+    }
+    checkTop(document, faults);
+    for (const SettingGroup& group : groupsInOrder()) {
+        if (document.isMember(group.command)) {
+            checkSection(group, document[group.command], faults);
+        }
+    }
+    if (document.isMember(rulesSection)) {
+        std::vector<std::string> ruleFaults;
+        rulesFromJson(document[rulesSection], ruleFaults);
+        for (const std::string& fault : ruleFaults) {
+            faults.push_back(rulesSection + (": " + fault));
+        }
+    }
+    return faults;
+}
+
+ImportPlan planImport(ApiClient& api, const Json::Value& document) {
+    ImportPlan plan;
+    if (document.isMember(rulesSection)) {
+        planRules(api, document[rulesSection], plan);
+    }
+    for (const SettingGroup& group : groupsInOrder()) {
+        if (document.isMember(group.command)) {
+            planGroup(api, group, document[group.command], plan);
+        }
+    }
+    return plan;
+}
+
+} // namespace velt::cli

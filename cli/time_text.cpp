@@ -1,0 +1,88 @@
+#include "cli/time_text.h"
+
+#include <charconv>
+#include <iomanip>
+#include <sstream>
+
+namespace velt::cli {
+
+namespace {
+
+constexpr std::int64_t minute = 60;
+constexpr std::int64_t hour = 60 * minute;
+constexpr std::int64_t day = 24 * hour;
+
+std::optional<std::int64_t> secondsOfUnit(char unit) {
+    switch (unit) {
+    case 's':
+        return 1;
+    case 'm':
+        return minute;
+    case 'h':
+        return hour;
+    case 'd':
+        return day;
+    default:
+        return std::nullopt;
+    }
+}
+
+bool startsWithDate(const std::string& text) {
+    static const std::string form = "dddd-dd-dd";
+    if (text.size() < form.size()) {
+        return false;
+    }
+    for (std::size_t i = 0; i < form.size(); ++i) {
+        const bool digit = text[i] >= '0' && text[i] <= '9';
+        if (form[i] == 'd' ? !digit : text[i] != form[i]) {
+            return false;
+        }
+    }
+    return true;
+}
+
+} // namespace
+
+std::string utcText(std::time_t time) {
+    std::tm parts{};
+    gmtime_r(&time, &parts);
+    std::ostringstream text;
+    text << std::put_time(&parts, "%Y-%m-%dT%H:%M:%SZ");
+    return text.str();
+}
+
+std::optional<std::string> parseSince(const std::string& text, std::time_t now) {
+    if (startsWithDate(text)) {
+        return text;
+    }
+    if (text.size() < 2) {
+        return std::nullopt;
+    }
+    const std::optional<std::int64_t> unit = secondsOfUnit(text.back());
+    std::int32_t count = 0;
+    const char* const end = text.data() + text.size() - 1;
+    const auto [rest, error] = std::from_chars(text.data(), end, count);
+    if (!unit || error != std::errc() || rest != end || count < 0) {
+        return std::nullopt;
+    }
+    return utcText(now - static_cast<std::time_t>(count * *unit));
+}
+
+std::string durationText(std::int64_t seconds) {
+    const auto two = [](std::int64_t first, const char* firstUnit, std::int64_t second,
+                        const char* secondUnit) {
+        return std::to_string(first) + firstUnit + std::to_string(second) + secondUnit;
+    };
+    if (seconds >= day) {
+        return two(seconds / day, " d ", seconds % day / hour, " h");
+    }
+    if (seconds >= hour) {
+        return two(seconds / hour, " h ", seconds % hour / minute, " min");
+    }
+    if (seconds >= minute) {
+        return two(seconds / minute, " min ", seconds % minute, " s");
+    }
+    return std::to_string(seconds) + " s";
+}
+
+} // namespace velt::cli

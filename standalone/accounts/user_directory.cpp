@@ -1,0 +1,256 @@
+#include "standalone/accounts/user_directory.h"
+
+#include "standalone/accounts/account_snapshot.h"
+#include "standalone/accounts/account_sources.h"
+#include "standalone/accounts/file_stamp.h"
+#include "standalone/accounts/name_service.h"
+#include "standalone/core/file_store.h"
+
+#include <algorithm>
+#include <array>
+#include <chrono>
+#include <mutex>
+
+namespace velt {
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+
+// How long a listing of the domain and LDAP sources is taken as current; they tell of no changes.
+constexpr std::chrono::seconds remoteLifetime{30};
+
+struct ModuleName {
+    std::string_view name;
+    int source;
+};
+constexpr std::array<ModuleName, 3> moduleNames{{
+    {"winbind", sourceDomain},
+    {"sss", sourceLdap},
+    {"ldap", sourceLdap},
+}};
+
+using Modules = std::vector<std::shared_ptr<const NameService>>;
+
+/// What is known of the accounts, and when it was learned. Everything happens under one lock, so that a change
+/// of a large file is read once, whoever asks.
+class Directory {
+public:
+    void setSources(AccountSources sources);
+    std::shared_ptr<const UserSnapshot> users();
+    std::shared_ptr<const GroupSnapshot> groups();
+    Modules modules();
+
+private:
+    bool remoteIsCurrent() const;
+    void readRemote();
+
+    std::mutex mutex_;
+    AccountSources sources_;
+    std::shared_ptr<const UserSnapshot> users_;
+    std::shared_ptr<const GroupSnapshot> groups_;
+    FileStamp passwdStamp_;
+    FileStamp loginDefsStamp_;
+    FileStamp groupStamp_;
+    Modules modules_;
+    std::vector<UserEntry> remote_;
+    std::optional<Clock::time_point> remoteReadAt_;
+};
+
+Directory& directory() {
+    static Directory instance;
+    return instance;
+}
+
+void Directory::setSources(AccountSources sources) {
+    const std::lock_guard lock(mutex_);
+    sources_ = std::move(sources);
+    users_.reset();
+    groups_.reset();
+    remoteReadAt_.reset();
+    modules_.clear();
+    remote_.clear();
+}
+
+bool Directory::remoteIsCurrent() const {
+    return remoteReadAt_ && Clock::now() - *remoteReadAt_ < remoteLifetime;
+}
+
+void Directory::readRemote() {
+    const std::string configuration = readFile(sources_.nsswitch).value_or("");
+    modules_.clear();
+    remote_.clear();
+    for (const ModuleName& module : moduleNames) {
+        // A module that is installed but not in use knows accounts that cannot log in.
+        if (!nsswitchNames(configuration, "passwd", module.name)) {
+            continue;
+        }
+        std::shared_ptr<const NameService> service =
+            NameService::load(sources_.moduleFolder, module.name, module.source);
+        if (service == nullptr) {
+            continue;
+        }
+        for (UserEntry& user : service->users()) {
+            remote_.push_back(std::move(user));
+        }
+        modules_.push_back(std::move(service));
+    }
+    remoteReadAt_ = Clock::now();
+}
+
+std::shared_ptr<const UserSnapshot> Directory::users() {
+    const std::lock_guard lock(mutex_);
+    const bool remoteIsOld = !remoteIsCurrent();
+    const FileStamp passwd = FileStamp::of(sources_.passwd);
+    const FileStamp loginDefs = FileStamp::of(sources_.loginDefs);
+    bool remoteChanged = false;
+    if (remoteIsOld) {
+        const bool hadRemote = !remote_.empty();
+        readRemote();
+        remoteChanged = hadRemote || !remote_.empty();
+    }
+    if (users_ != nullptr && !remoteChanged && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
+        return users_;
+    }
+    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remote_,
+                                parseLoginDefs(readFile(sources_.loginDefs).value_or("")));
+    passwdStamp_ = passwd;
+    loginDefsStamp_ = loginDefs;
+    return users_;
+}
+
+std::shared_ptr<const GroupSnapshot> Directory::groups() {
+    const std::lock_guard lock(mutex_);
+    const FileStamp stamp = FileStamp::of(sources_.group);
+    if (groups_ == nullptr || !(stamp == groupStamp_)) {
+        groups_ = std::make_shared<const GroupSnapshot>(parseGroup(readFile(sources_.group).value_or("")));
+        groupStamp_ = stamp;
+    }
+    return groups_;
+}
+
+Modules Directory::modules() {
+    const std::lock_guard lock(mutex_);
+    if (!remoteIsCurrent()) {
+        readRemote();
+    }
+    return modules_;
+}
+
+char lower(char character) {
+    return character >= 'A' && character <= 'Z' ? static_cast<char>(character - 'A' + 'a') : character;
+}
+
+bool sameLetters(std::string_view a, std::string_view b) {
+    return std::equal(a.begin(), a.end(), b.begin(), b.end(),
+                      [](char x, char y) { return lower(x) == lower(y); });
+}
+
+bool containsLetters(std::string_view text, std::string_view part) {
+    return std::search(text.begin(), text.end(), part.begin(), part.end(),
+                       [](char x, char y) { return lower(x) == lower(y); }) != text.end();
+}
+
+} // namespace
+
+void setAccountSources(AccountSources sources) {
+    directory().setSources(std::move(sources));
+}
+
+std::shared_ptr<const std::vector<UserEntry>> allUsers() {
+    std::shared_ptr<const UserSnapshot> snapshot = directory().users();
+    const std::vector<UserEntry>& people = snapshot->people.users();
+    return {std::move(snapshot), &people};
+}
+
+std::optional<UserEntry> userByName(const std::string& name) {
+    const std::shared_ptr<const UserSnapshot> snapshot = directory().users();
+    if (const UserEntry* user = snapshot->systemAccounts.byName(name)) {
+        return *user;
+    }
+    if (const UserEntry* user = snapshot->people.byName(name)) {
+        return *user;
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<UserEntry> user = module->userByName(name)) {
+            return user;
+        }
+    }
+    return std::nullopt;
+}
+
+std::optional<UserEntry> userById(uid_t uid) {
+    const std::shared_ptr<const UserSnapshot> snapshot = directory().users();
+    if (const UserEntry* user = snapshot->systemAccounts.byId(uid)) {
+        return *user;
+    }
+    if (const UserEntry* user = snapshot->people.byId(uid)) {
+        return *user;
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<UserEntry> user = module->userById(uid)) {
+            return user;
+        }
+    }
+    return std::nullopt;
+}
+
+std::optional<GroupEntry> groupByName(const std::string& name) {
+    if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byName(name)) {
+        return *group;
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<GroupEntry> group = module->groupByName(name)) {
+            return group;
+        }
+    }
+    return std::nullopt;
+}
+
+std::optional<GroupEntry> groupById(gid_t gid) {
+    if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byId(gid)) {
+        return *group;
+    }
+    for (const auto& module : directory().modules()) {
+        if (std::optional<GroupEntry> group = module->groupById(gid)) {
+            return group;
+        }
+    }
+    return std::nullopt;
+}
+
+std::vector<gid_t> groupsOf(const UserEntry& user) {
+    std::vector<gid_t> groups{user.gid};
+    const auto add = [&groups](const std::vector<gid_t>& further) {
+        for (const gid_t gid : further) {
+            if (std::find(groups.begin(), groups.end(), gid) == groups.end()) {
+                groups.push_back(gid);
+            }
+        }
+    };
+    add(directory().groups()->groupsOf(user.name));
+    for (const auto& module : directory().modules()) {
+        add(module->groupsOf(user.name, user.gid));
+    }
+    return groups;
+}
+
+bool matches(const UserEntry& user, const UserFilter& filter) {
+    if ((user.source & filter.sources) == 0) {
+        return false;
+    }
+    if (!filter.substring.empty() && !containsLetters(user.name, filter.substring)) {
+        return false;
+    }
+    if (filter.domain.empty()) {
+        return true;
+    }
+    const std::string_view name = user.name;
+    if (const std::size_t slash = name.find('\\'); slash != std::string_view::npos) {
+        return sameLetters(name.substr(0, slash), filter.domain);
+    }
+    const std::size_t at = name.rfind('@');
+    return at != std::string_view::npos && sameLetters(name.substr(at + 1), filter.domain);
+}
+
+} // namespace velt

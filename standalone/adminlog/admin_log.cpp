@@ -1,0 +1,107 @@
+// The administrator log: who changed what, when, and from where. A database that several processes write at once.
+#include "platform/adminlog.h"
+
+#include "standalone/adminlog/catalogue.h"
+#include "standalone/adminlog/log_database.h"
+#include "standalone/adminlog/request_actor.h"
+#include "standalone/core/boundary.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/events/event_bus.h"
+#include "standalone/standalone.h"
+#include "standalone/text/plain_text.h"
+
+#include <syslog.h>
+
+#include <mutex>
+
+namespace velt {
+
+namespace {
+
+constexpr std::size_t longestText = 1024;
+constexpr std::size_t longestActor = 255;
+constexpr int longestPage = 1000;
+
+struct Connection {
+    std::mutex mutex;
+    std::unique_ptr<LogDatabase> database;
+};
+
+Connection& connection() {
+    static Connection instance;
+    return instance;
+}
+
+/// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held. Null, with
+/// the last error set, when it cannot be opened.
+LogDatabase* currentDatabase(Connection& open) {
+    if (open.database != nullptr && !open.database->isOwn()) {
+        fail(ErrorNumber::log,
+             "A process that was forked off while the administrator log was open cannot use it.");
+        return nullptr;
+    }
+    const std::filesystem::path path = statePath("/var/lib/velt/log.db");
+    if (open.database == nullptr || !open.database->leadsTo(path)) {
+        open.database.reset();
+        open.database = LogDatabase::open(path);
+    }
+    return open.database.get();
+}
+
+int store(LogEntry& entry) {
+    const std::optional<LogRetention> retention = loadRetention();
+    // Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
+    if (!retention) {
+        syslog(LOG_WARNING, "administrator log: nothing is removed: %s", lastErrorSentence().c_str());
+    }
+    Connection& open = connection();
+    const std::lock_guard lock(open.mutex);
+    LogDatabase* database = currentDatabase(open);
+    return database == nullptr ? -1 : database->append(entry, retention);
+}
+
+LogEntry makeEntry(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
+    LogEntry entry;
+    entry.time = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
+    entry.category = category;
+    entry.level = level;
+    entry.event = event;
+    for (std::size_t i = 0; i < texts.size(); ++i) {
+        entry.texts[i] = plainText(texts[i] == nullptr ? "" : texts[i], longestText);
+    }
+    entry.sentence = sentenceOf(event, entry.texts);
+    entry.actor = plainText(requestActor().actor, longestActor);
+    entry.address = plainText(requestActor().address, longestActor);
+    return entry;
+}
+
+} // namespace
+
+std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
+    if (filter.limit < 1 || filter.limit > longestPage) {
+        fail(ErrorNumber::invalid, "A page of the administrator log has 1 to 1000 entries.");
+        return std::nullopt;
+    }
+    Connection& open = connection();
+    const std::lock_guard lock(open.mutex);
+    LogDatabase* database = currentDatabase(open);
+    return database == nullptr ? std::nullopt : database->query(filter);
+}
+
+} // namespace velt
+
+int VELTLogSet1(int category, int level, unsigned event, const char* arg1, const char* arg2, const char* arg3,
+                const char* arg4) {
+    return velt::atBoundary([&] {
+        velt::LogEntry entry = velt::makeEntry(category, level, event, {arg1, arg2, arg3, arg4});
+        return velt::perform(velt::Effect::logEntry, entry.sentence, [&entry] {
+            if (velt::store(entry) < 0) {
+                return -1;
+            }
+            velt::publish(entry);
+            return 0;
+        });
+    });
+}

@@ -1,0 +1,29 @@
+// Where the library's C++ ends and the contract's C begins.
+#ifndef VELT_STANDALONE_CORE_BOUNDARY_H
+#define VELT_STANDALONE_CORE_BOUNDARY_H
+
+#include "standalone/core/last_error.h"
+
+#include <exception>
+#include <new>
+#include <string>
+#include <utility>
+
+namespace velt {
+
+/// Calls `operation` and returns its int. An exception does not leave it: the result is then -1, with the
+/// last error set. The body of a contract function that can throw, allocation included, stands in it.
+template<class Operation> int atBoundary(Operation&& operation) noexcept {
+    try {
+        return std::forward<Operation>(operation)();
+    } catch (const std::bad_alloc&) {
+        // An empty sentence needs no memory.
+        return fail(ErrorNumber::outOfMemory, std::string());
+    } catch (const std::exception& error) {
+        return fail(ErrorNumber::store, std::string("Unexpected failure: ") + error.what() + ".");
+    }
+}
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,74 @@
+#include "standalone/core/effects.h"
+
+#include "standalone/core/last_error.h"
+
+#include <utility>
+
+namespace velt {
+
+namespace {
+
+EffectHook& threadHook() {
+    thread_local EffectHook hook;
+    return hook;
+}
+
+ErrorNumber errorOf(Effect effect) {
+    switch (effect) {
+    case Effect::store:
+    case Effect::runKey:
+        return ErrorNumber::store;
+    case Effect::firewall:
+        return ErrorNumber::firewall;
+    case Effect::stop:
+    case Effect::start:
+        return ErrorNumber::daemon;
+    case Effect::event:
+        return ErrorNumber::event;
+    case Effect::logEntry:
+        return ErrorNumber::log;
+    }
+    return ErrorNumber::invalid;
+}
+
+} // namespace
+
+std::string_view effectName(Effect effect) {
+    switch (effect) {
+    case Effect::store:
+        return "store";
+    case Effect::firewall:
+        return "firewall";
+    case Effect::stop:
+        return "stop";
+    case Effect::start:
+        return "start";
+    case Effect::runKey:
+        return "run key";
+    case Effect::event:
+        return "event";
+    case Effect::logEntry:
+        return "log";
+    }
+    return "";
+}
+
+int perform(Effect effect, std::string_view subject, const std::function<int()>& act) {
+    // A copy, since the hook may replace itself while it runs.
+    const EffectHook hook = threadHook();
+    if (!hook)
+        return act();
+    const EffectDecision decision = hook(effect, subject);
+    if (decision.doIt)
+        return act();
+    if (decision.result < 0)
+        fail(errorOf(effect), "The effect \"" + std::string(effectName(effect)) + "\" on " +
+                                  std::string(subject) + " was refused.");
+    return decision.result;
+}
+
+void setEffectHook(EffectHook hook) {
+    threadHook() = std::move(hook);
+}
+
+} // namespace velt

@@ -1,0 +1,133 @@
+#include "standalone/core/file_store.h"
+
+#include "standalone/core/last_error.h"
+#include "standalone/core/unique_fd.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <vector>
+
+namespace velt {
+
+namespace fs = std::filesystem;
+
+namespace {
+
+int failHere(const char* what, const fs::path& path, int error, SourcePlace where = SourcePlace::current()) {
+    return fail(ErrorNumber::store,
+                std::string("Cannot ") + what + " " + path.string() + ": " + std::strerror(error) + ".",
+                where);
+}
+
+int syncFolder(const fs::path& folder) {
+    const UniqueFd fd(::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (!fd || ::fsync(fd.get()) != 0)
+        return failHere("write the folder", folder, errno);
+    return 0;
+}
+
+// Each new folder is made durable in the one that holds it, or a crash could take it away again together with
+// the file that was stored in it.
+int makeFolder(const fs::path& folder) {
+    std::vector<fs::path> missing;
+    for (fs::path at = folder; !at.empty() && ::access(at.c_str(), F_OK) != 0; at = at.parent_path()) {
+        missing.push_back(at);
+        if (at == at.parent_path())
+            break;
+    }
+    for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
+        if (::mkdir(at->c_str(), 0755) != 0 && errno != EEXIST)
+            return failHere("make the folder", *at, errno);
+        if (syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")) < 0)
+            return -1;
+    }
+    return 0;
+}
+
+bool isSameFile(int fd, const fs::path& path) {
+    struct stat opened {};
+    struct stat named {};
+    return ::fstat(fd, &opened) == 0 && ::lstat(path.c_str(), &named) == 0 && opened.st_dev == named.st_dev &&
+           opened.st_ino == named.st_ino;
+}
+
+// The temporary file has one fixed name, so that what a crash leaves behind is taken up by the next store and
+// never piles up. Its lock keeps a second writer out until the first has renamed it; the second then holds a
+// file that has lost its name, and begins anew.
+UniqueFd openTemporary(const fs::path& path) {
+    for (;;) {
+        UniqueFd fd(::open(path.c_str(), O_WRONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
+        if (!fd)
+            return fd;
+        while (::flock(fd.get(), LOCK_EX) != 0)
+            if (errno != EINTR)
+                return UniqueFd();
+        if (isSameFile(fd.get(), path))
+            return fd;
+    }
+}
+
+bool writeAll(int fd, std::string_view contents) {
+    while (!contents.empty()) {
+        const ssize_t written = ::write(fd, contents.data(), contents.size());
+        if (written < 0) {
+            if (errno == EINTR)
+                continue;
+            return false;
+        }
+        contents.remove_prefix(static_cast<std::size_t>(written));
+    }
+    return true;
+}
+
+} // namespace
+
+int replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
+    const fs::path folder = path.has_parent_path() ? path.parent_path() : fs::path(".");
+    if (makeFolder(folder) < 0)
+        return -1;
+    const fs::path temporary = folder / ("." + path.filename().string() + ".new");
+    const UniqueFd fd = openTemporary(temporary);
+    if (!fd)
+        return failHere("make", temporary, errno);
+    if (::ftruncate(fd.get(), 0) != 0 || ::fchmod(fd.get(), mode) != 0 || !writeAll(fd.get(), contents) ||
+        ::fsync(fd.get()) != 0) {
+        const int error = errno;
+        ::unlink(temporary.c_str());
+        return failHere("write", temporary, error);
+    }
+    if (::rename(temporary.c_str(), path.c_str()) != 0) {
+        const int error = errno;
+        ::unlink(temporary.c_str());
+        return failHere("replace", path, error);
+    }
+    return syncFolder(folder);
+}
+
+std::optional<std::string> readFile(const fs::path& path) {
+    const UniqueFd fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+    if (!fd)
+        return std::nullopt;
+    std::string contents;
+    std::string block(65536, '\0');
+    for (;;) {
+        const ssize_t got = ::read(fd.get(), block.data(), block.size());
+        if (got == 0)
+            return contents;
+        if (got > 0) {
+            contents.append(block, 0, static_cast<std::size_t>(got));
+        } else if (errno != EINTR) {
+            const int error = errno;
+            contents.clear();
+            errno = error;
+            return std::nullopt;
+        }
+    }
+}
+
+} // namespace velt

@@ -1,0 +1,145 @@
+#include "standalone/core/key_value_file.h"
+
+#include "platform/core.h"
+#include "standalone/core/boundary.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <optional>
+
+namespace velt {
+
+namespace {
+
+constexpr std::size_t longestValue = 4096;
+
+std::string_view trimmed(std::string_view text) {
+    constexpr std::string_view blanks = " \t\r";
+    const auto first = text.find_first_not_of(blanks);
+    if (first == std::string_view::npos)
+        return {};
+    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+std::string_view unquoted(std::string_view value) {
+    if (value.size() >= 2 && value.front() == '"' && value.back() == '"')
+        return value.substr(1, value.size() - 2);
+    return value;
+}
+
+// What a reader would trim or unquote goes into quotes, of which the reader takes one pair away.
+std::string quotedIfNeeded(std::string_view value) {
+    if (value == trimmed(value) && value == unquoted(value))
+        return std::string(value);
+    return '"' + std::string(value) + '"';
+}
+
+struct FoundLine {
+    std::size_t begin = 0;
+    std::size_t length = 0; ///< without the line's end
+    std::string_view value;
+};
+
+std::optional<FoundLine> findKey(std::string_view contents, std::string_view key) {
+    std::optional<FoundLine> found;
+    for (std::size_t at = 0; at < contents.size();) {
+        const std::string_view line = contents.substr(at, contents.find('\n', at) - at);
+        const auto equals = line.find('=');
+        if (equals != std::string_view::npos && trimmed(line.substr(0, equals)) == key)
+            found = FoundLine{at, line.size(), unquoted(trimmed(line.substr(equals + 1)))};
+        at += line.size() + 1;
+    }
+    return found;
+}
+
+int readContents(const std::filesystem::path& file, std::string& contents) {
+    auto read = readFile(file);
+    if (!read && errno == ENOENT)
+        return 0;
+    if (!read)
+        return fail(ErrorNumber::store, "Cannot read " + file.string() + ": " + std::strerror(errno) + ".");
+    contents = std::move(*read);
+    return 1;
+}
+
+bool isControl(char byte) {
+    const auto value = static_cast<unsigned char>(byte);
+    return value < 0x20 || value == 0x7f;
+}
+
+bool isKeyByte(char byte) {
+    return (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z') || (byte >= '0' && byte <= '9') ||
+           byte == '_' || byte == '-' || byte == '.';
+}
+
+int checkKeyValue(std::string_view key, std::string_view value) {
+    if (key.empty() || !std::all_of(key.begin(), key.end(), isKeyByte))
+        return fail(ErrorNumber::invalid,
+                    "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.");
+    const std::string name(key);
+    if (value.size() > longestValue)
+        return fail(ErrorNumber::invalid,
+                    "The value of " + name + " is longer than " + std::to_string(longestValue) + " bytes.");
+    if (std::any_of(value.begin(), value.end(), isControl))
+        return fail(ErrorNumber::invalid,
+                    "The value of " + name + " contains a line end or another control byte.");
+    return 0;
+}
+
+mode_t modeOf(const std::filesystem::path& file) {
+    struct stat status {};
+    return ::stat(file.c_str(), &status) == 0 ? status.st_mode & 0777 : 0644;
+}
+
+} // namespace
+
+int readKeyValue(const std::filesystem::path& file, std::string_view key, std::string& value) {
+    std::string contents;
+    const int read = readContents(file, contents);
+    if (read <= 0)
+        return read;
+    const auto found = findKey(contents, key);
+    if (!found)
+        return 0;
+    value = found->value;
+    return 1;
+}
+
+int writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value) {
+    std::string contents;
+    if (checkKeyValue(key, value) < 0 || readContents(file, contents) < 0)
+        return -1;
+    const std::string line = std::string(key) + '=' + quotedIfNeeded(value);
+    if (const auto found = findKey(contents, key)) {
+        contents.replace(found->begin, found->length, line);
+    } else {
+        if (!contents.empty() && contents.back() != '\n')
+            contents += '\n';
+        contents += line + '\n';
+    }
+    return replaceFile(file, contents, modeOf(file));
+}
+
+} // namespace velt
+
+int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int size, int /*flags*/) {
+    if (path == nullptr || key == nullptr || value == nullptr || size < 1)
+        return velt::fail(velt::ErrorNumber::invalid, "There is no file, no key or no room for its value.");
+    return velt::atBoundary([&] {
+        std::string text;
+        const int result = velt::readKeyValue(velt::statePath(path), key, text);
+        if (result > 0) {
+            // A NUL byte in the file ends the value for every reader of C strings; so it does here.
+            const auto length = std::min({text.size(), text.find('\0'), static_cast<std::size_t>(size - 1)});
+            std::memcpy(value, text.data(), length);
+            value[length] = '\0';
+        }
+        return result;
+    });
+}

@@ -1,0 +1,27 @@
+// Text files of key=value lines, as other programs of the server keep them.
+//
+// A line is a comment ("# ..."), blank, or "key=value" with blanks around either part left out; a value may
+// stand in double quotes. Where a key stands twice, the last line counts. Any other line is somebody else's
+// and is left alone.
+#ifndef VELT_STANDALONE_CORE_KEY_VALUE_FILE_H
+#define VELT_STANDALONE_CORE_KEY_VALUE_FILE_H
+
+#include <filesystem>
+#include <string>
+#include <string_view>
+
+namespace velt {
+
+/// Reads the key's value. Positive when it is there, 0 when the key or the whole file is not, negative when
+/// the file cannot be read (last error set). Thread-safe.
+int readKeyValue(const std::filesystem::path& file, std::string_view key, std::string& value);
+
+/// Writes the key's value in the line where it stands, or in a new last line; all other bytes of the file
+/// stay, and so does its mode (a new file gets 0644). Refuses, with the last error set, a key other than
+/// letters, digits, "_", "-" and ".", and a value with a control byte or of more than 4096 bytes. To be
+/// called under the StateLock.
+int writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value);
+
+} // namespace velt
+
+#endif

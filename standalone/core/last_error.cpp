@@ -1,0 +1,62 @@
+#include "standalone/core/last_error.h"
+
+#include "platform/core.h"
+
+#include <string_view>
+#include <utility>
+
+namespace velt {
+
+namespace {
+
+struct LastError {
+    ErrorNumber number = ErrorNumber::none;
+    std::string sentence;
+    const char* file = "";
+    int line = 0;
+};
+
+LastError& lastError() {
+    thread_local LastError error;
+    return error;
+}
+
+// The result points into the string literal that the compiler made for the place, so it never goes away.
+const char* bareFileName(const char* path) {
+    const std::string_view name(path);
+    const auto slash = name.rfind('/');
+    return slash == std::string_view::npos ? path : path + slash + 1;
+}
+
+} // namespace
+
+int fail(ErrorNumber number, std::string sentence, SourcePlace where) {
+    LastError& error = lastError();
+    error.number = number;
+    error.sentence = std::move(sentence);
+    error.file = bareFileName(where.file);
+    error.line = where.line;
+    return -1;
+}
+
+const std::string& lastErrorSentence() {
+    return lastError().sentence;
+}
+
+void clearLastError() {
+    lastError() = LastError();
+}
+
+} // namespace velt
+
+int VLIBCErrGet(void) {
+    return static_cast<int>(velt::lastError().number);
+}
+
+const char* VLIBCErrorGetFile(void) {
+    return velt::lastError().file;
+}
+
+int VLIBCErrorGetLine(void) {
+    return velt::lastError().line;
+}

@@ -1,0 +1,15 @@
+// System events and log entries on their way to the subscribers in this process.
+#ifndef VELT_STANDALONE_EVENTS_EVENT_BUS_H
+#define VELT_STANDALONE_EVENTS_EVENT_BUS_H
+
+#include "standalone/standalone.h"
+
+namespace velt {
+
+/// Calls the subscribers, each for itself one call at a time. What they throw is dropped. Thread-safe.
+void publish(const SystemEvent& event);
+void publish(const LogEntry& entry);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,126 @@
+#include "platform/firewall.h"
+
+#include "standalone/core/boundary.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
+#include "standalone/core/state_root.h"
+#include "standalone/firewall/firewall_settings.h"
+#include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/ruleset.h"
+#include "standalone/settings/settings.h"
+#include "standalone/supervise/process_identity.h"
+
+#include <syslog.h>
+
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace velt {
+namespace {
+
+/// Stands while rules of ours are loaded, with the boot of the machine in which they were: below a state root other than "/"
+/// the file outlives a boot, the rules do not.
+std::filesystem::path loadedMark() {
+    return statePath("/run/velt/firewall.loaded");
+}
+
+bool rulesAreLoaded() {
+    return readFile(loadedMark()) == bootId();
+}
+
+/// For the administrator: why ports may be closed although we opened them.
+std::filesystem::path warningFile() {
+    return statePath("/run/velt/firewall.warning");
+}
+
+std::string firstLine(const std::string& text) {
+    return text.substr(0, text.find('\n'));
+}
+
+int failToLoad(const ProcessResult& result) {
+    std::string reason = firstLine(result.errors);
+    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
+        reason.pop_back(); // it may be a sentence of its own
+    }
+    if (reason.find("Operation not permitted") != std::string::npos) {
+        return fail(ErrorNumber::firewall,
+                    "The firewall rules are not loaded: this process may not administer the network.");
+    }
+    return fail(ErrorNumber::firewall, "The firewall rules are not loaded: " + reason + ".");
+}
+
+void warnOfForeignTables() {
+    const std::vector<std::string> chains =
+        foreignDropChains(runProcess({"nft", "--json", "list", "chains"}).output);
+    std::error_code ignored;
+    if (chains.empty()) {
+        std::filesystem::remove(warningFile(), ignored);
+        return;
+    }
+    std::string text;
+    for (const std::string& chain : chains) {
+        text += "The chain \"" + chain +
+                "\" of another firewall drops what it does not accept itself, so ports of the file-transfer "
+                "services may stay closed.\n";
+    }
+    ::syslog(LOG_WARNING, "%s", firstLine(text).c_str());
+    // The rules are in force by now: a note that cannot be left is no reason to call them failed.
+    if (replaceFile(warningFile(), text, 0644) < 0) {
+        ::syslog(LOG_WARNING, "%s", lastErrorSentence().c_str());
+    }
+}
+
+/// The rules belong to the machine, so an installation below another root leaves them alone unless it was told about a
+/// firewall: its defaults would take away what the machine's own installation drops.
+bool mayTouchRules() {
+    std::error_code ignored;
+    return statePath("/") == "/" || std::filesystem::exists(statePath("/etc/velt/firewall.conf"), ignored);
+}
+
+int loadRules() {
+    if (!mayTouchRules()) {
+        return 0;
+    }
+    // Held until the rules are loaded: of two processes the one with the older settings must not load its rules last.
+    const StateLock lock;
+    const auto firewall = lock ? loadFirewallSettings() : std::nullopt;
+    if (!firewall) {
+        return -1;
+    }
+    std::error_code ignored;
+    if (firewall->mode == FirewallMode::off && !rulesAreLoaded()) {
+        return 0; // nothing to take away, and perhaps no right to do it
+    }
+    const auto ftp = loadFtpSettings();
+    const auto sftp = loadSftpSettings();
+    if (!ftp || !sftp) {
+        return -1;
+    }
+    // Before the rules, since a mark without rules does no harm.
+    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), bootId(), 0644) < 0) {
+        return -1;
+    }
+    const ProcessResult result =
+        runProcess({"nft", "-f", "-"}, renderRuleset(*firewall, servicePorts(*ftp, *sftp)));
+    if (result.exitCode != 0) {
+        return failToLoad(result);
+    }
+    if (firewall->mode == FirewallMode::off) {
+        std::filesystem::remove(loadedMark(), ignored);
+        std::filesystem::remove(warningFile(), ignored);
+        return 0;
+    }
+    warnOfForeignTables();
+    return 0;
+}
+
+} // namespace
+} // namespace velt
+
+int VELTFwRuleHup(void) {
+    return velt::atBoundary(
+        [] { return velt::perform(velt::Effect::firewall, "firewall rules", velt::loadRules); });
+}

@@ -1,0 +1,15 @@
+#include "standalone/core/boundary.h"
+#include "standalone/core/state_root.h"
+#include "standalone/settings/settings.h"
+#include "standalone/standalone.h"
+
+namespace velt {
+
+int openState(const std::filesystem::path& root) {
+    return atBoundary([&] {
+        setStateRoot(root);
+        return writeMissingSettings();
+    });
+}
+
+} // namespace velt

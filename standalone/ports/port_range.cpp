@@ -1,0 +1,35 @@
+#include "standalone/ports/port_range.h"
+
+#include <charconv>
+
+namespace velt {
+namespace {
+
+std::optional<int> parsePort(std::string_view text) {
+    int port = 0;
+    const char* end = text.data() + text.size();
+    const auto [rest, problem] = std::from_chars(text.data(), end, port);
+    if (problem != std::errc{} || rest != end || port < 1 || port > 65535) {
+        return std::nullopt;
+    }
+    return port;
+}
+
+} // namespace
+
+std::optional<VELT_FTP_PORT_RANGE> parsePortRange(std::string_view text) {
+    const auto dash = text.find('-');
+    const auto first = parsePort(text.substr(0, dash));
+    const auto last = dash == std::string_view::npos ? first : parsePort(text.substr(dash + 1));
+    if (!first || !last || *first > *last) {
+        return std::nullopt;
+    }
+    return VELT_FTP_PORT_RANGE{*first, *last};
+}
+
+std::string formatPortRange(const VELT_FTP_PORT_RANGE& range) {
+    const std::string first = std::to_string(range.first);
+    return range.first == range.last ? first : first + "-" + std::to_string(range.last);
+}
+
+} // namespace velt

@@ -1,0 +1,132 @@
+#include "standalone/daemon_plan.h"
+
+#include "standalone/chroot/rule_store.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/daemon_test.h"
+#include "standalone/installed_files.h"
+#include "standalone/proftpd/places.h"
+#include "standalone/proftpd/share_lists.h"
+#include "standalone/settings/candidate.h"
+#include "standalone/tls/digest.h"
+
+#include <cstdlib>
+
+namespace velt {
+namespace {
+
+constexpr const char* program = "/usr/sbin/proftpd";
+
+// The same text, but for the files that the daemon would write: its test writes some of them, too.
+int testRendering(const FtpSettings& settings, ProftpdPlaces places) {
+    const ScratchFolder scratch;
+    if (!scratch) {
+        return -1;
+    }
+    places.runFolder = scratch.path();
+    const auto configuration = scratch.path() / "proftpd.conf";
+    if (replaceFile(configuration, renderProftpd(settings, places), 0600) < 0) {
+        return -1;
+    }
+    return runDaemonTest("FTP", {program, "-t", "-c", configuration.string()});
+}
+
+int makeFolder(const std::filesystem::path& path) {
+    std::error_code error;
+    std::filesystem::create_directories(path, error);
+    if (!error) {
+        // Sessions walk through them as the user who logged in; nobody else may write there.
+        std::filesystem::permissions(path, std::filesystem::perms(0755), error);
+    }
+    return error ? fail(ErrorNumber::store,
+                        "The folder " + path.string() + " cannot be made: " + error.message() + ".")
+                 : 0;
+}
+
+int replaceLink(const std::filesystem::path& link, const std::filesystem::path& target) {
+    std::error_code error;
+    const auto next = std::filesystem::path(link.string() + ".new");
+    std::filesystem::remove(next, error);
+    if (target.empty()) {
+        std::filesystem::remove(link, error);
+    } else if (std::filesystem::create_symlink(target, next, error); !error) {
+        std::filesystem::rename(next, link, error);
+    }
+    return error ? fail(ErrorNumber::store,
+                        "The link " + link.string() + " cannot be made: " + error.message() + ".")
+                 : 0;
+}
+
+/// Stands for all that a daemon reads at its start and nowhere else.
+std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
+    std::string all = renderProftpd(settings, found.places);
+    for (const std::string& part :
+         {found.anonymousFolder.string(), found.mounts, found.certificateFingerprint,
+          installedFile("velt-share-root").string()}) {
+        all += '\0' + part;
+    }
+    return sha256(all);
+}
+
+int writeSurroundings(const FtpSurroundings& found) {
+    const auto& places = found.places;
+    if (makeFolder(places.runFolder) < 0 || makeFolder(places.shareRoot) < 0 ||
+        makeFolder(places.anonymousLink.parent_path()) < 0 ||
+        replaceLink(places.anonymousLink, found.anonymousFolder) < 0 || makeRulesFile() < 0) {
+        return -1;
+    }
+    return refreshShareMap();
+}
+
+std::optional<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found) {
+    DaemonPlan plan;
+    plan.configurationHash = hashOf(settings, found);
+    plan.folder = found.places.runFolder / "configurations" / plan.configurationHash;
+    found.places.anonymousLink = plan.folder / "anonymous";
+    const auto configuration = plan.folder / "proftpd.conf";
+    const auto mountList = plan.folder / "mounts";
+    if (writeSurroundings(found) < 0 ||
+        replaceFile(configuration, renderProftpd(settings, found.places), 0600) < 0 ||
+        replaceFile(mountList, found.mounts, 0600) < 0) {
+        return std::nullopt;
+    }
+    if (needsShareRoot(settings) && !found.places.accountFiles) {
+        plan.arguments = {installedFile("velt-share-root"), mountList, found.places.shareRoot};
+    }
+    // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
+    plan.arguments.insert(plan.arguments.end(), {program, "-n", "-c", configuration.string()});
+    plan.executable = program;
+    plan.listenPorts = {std::atoi(settings.record.portnum)};
+    return plan;
+}
+
+} // namespace
+
+int testFtpCandidate(const FtpSettings& settings) {
+    const auto found = surveyFtp(settings);
+    return found ? testRendering(settings, found->places) : -1;
+}
+
+std::optional<DaemonPlan> planFtpDaemon() {
+    const StateLock lock;
+    const auto settings = lock ? loadFtpSettings() : std::nullopt;
+    if (!settings) {
+        return std::nullopt;
+    }
+    if ((settings->record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) == 0) {
+        fail(ErrorNumber::invalid, "Neither FTP nor FTPS is enabled.");
+        return std::nullopt;
+    }
+    const auto found = checkFtpSettings(*settings) < 0 ? std::nullopt : surveyFtp(*settings);
+    if (!found || testRendering(*settings, found->places) < 0) {
+        return std::nullopt;
+    }
+    return writePlan(*settings, *found);
+}
+
+int refreshShareMap() {
+    const auto shares = allShares();
+    return shares ? replaceFile(ftpRunFolder() / "shares.map", shareMapText(*shares), 0644) : -1;
+}
+
+} // namespace velt

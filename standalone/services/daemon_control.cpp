@@ -1,0 +1,165 @@
+#include "standalone/services/daemon_control.h"
+
+#include "platform/firewall.h"
+#include "standalone/core/file_lock.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/unique_fd.h"
+#include "standalone/ports/port_probe.h"
+#include "standalone/services/service_backend.h"
+#include "standalone/settings/candidate.h"
+#include "standalone/settings/settings.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <syslog.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <string>
+#include <utility>
+
+namespace velt {
+namespace {
+
+constexpr std::array<std::pair<std::string_view, Daemon>, 4> services{{
+    {"ftpd", Daemon::ftp},
+    {"ftpd-pure", Daemon::ftp},
+    {"ftpd-ssl", Daemon::ftp},
+    {"sftp", Daemon::sftp},
+}};
+
+std::string nameOf(Daemon daemon) {
+    return daemon == Daemon::ftp ? "ftpd" : "sftp";
+}
+
+/// One operation on a daemon at a time, over all threads and processes. Not the lock of the settings: a start may take
+/// seconds, in which settings can be read and written.
+class OperationLock {
+public:
+    explicit OperationLock(Daemon daemon) {
+        const std::filesystem::path directory = runDirectory();
+        if (directory.empty()) {
+            return;
+        }
+        const std::filesystem::path file = directory / (nameOf(daemon) + ".operation");
+        descriptor_ = UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
+        if (!descriptor_) {
+            fail(ErrorNumber::store,
+                 "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
+            return;
+        }
+        held_ = waitForFileLock(descriptor_.get(), file) >= 0;
+    }
+
+    explicit operator bool() const { return held_; }
+
+private:
+    UniqueFd descriptor_;
+    bool held_ = false;
+};
+
+bool ftpIsWanted(const FtpSettings& settings) {
+    return (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
+}
+
+/// What a stop for a restart needs to know of the stored settings.
+struct NextStart {
+    bool wanted = false;  ///< false also when the settings cannot be read
+    bool possible = true; ///< else the last error says why not
+};
+
+/// The configuration's test takes the daemon's time, so nothing is tested where nothing runs.
+NextStart nextStart(Daemon daemon, const ServiceState& now) {
+    const bool serving = isServing(now);
+    const auto portIsFree = [&now](int port) { return probePorts({port}, now.daemon.pid) >= 0; };
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        if (!settings || !ftpIsWanted(*settings)) {
+            return {};
+        }
+        return {true,
+                !serving || (portIsFree(controlPort(settings->record)) && testFtpCandidate(*settings) >= 0)};
+    }
+    const auto settings = loadSftpSettings();
+    if (!settings || !settings->enabled) {
+        return {};
+    }
+    return {true, !serving || (portIsFree(settings->port) && testSftpCandidate(*settings) >= 0)};
+}
+
+/// After a start or a stop with this result: the rules open the ports of what is enabled, which may have changed although no
+/// port did. A daemon that did what was asked of it has not failed because of them.
+int followedByFirewall(int result) {
+    if (result >= 0 && VELTFwRuleHup() < 0) {
+        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    }
+    return result;
+}
+
+} // namespace
+
+std::optional<Daemon> daemonOf(const char* service) {
+    const std::string_view name = service == nullptr ? std::string_view() : service;
+    for (const auto& [known, daemon] : services) {
+        if (known == name) {
+            return daemon;
+        }
+    }
+    fail(ErrorNumber::notFound, "There is no service \"" + std::string(name) + "\".");
+    return std::nullopt;
+}
+
+int startDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    const auto backend = makeServiceBackend(nameOf(daemon));
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        if (!settings) {
+            return -1;
+        }
+        if (!ftpIsWanted(*settings)) {
+            return followedByFirewall(backend->stop());
+        }
+    }
+    const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
+    if (!plan || backend->start(*plan) < 0) {
+        return -1;
+    }
+    removeFormerPlans(*plan);
+    return followedByFirewall(0);
+}
+
+int stopDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    return lock ? followedByFirewall(makeServiceBackend(nameOf(daemon))->stop()) : -1;
+}
+
+int stopDaemonForRestart(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    const auto backend = makeServiceBackend(nameOf(daemon));
+    const NextStart next = nextStart(daemon, backend->state());
+    if (!next.possible) {
+        return -1;
+    }
+    // What is still wanted is started next, and the firewall follows that.
+    const int result = backend->stop();
+    return next.wanted ? result : followedByFirewall(result);
+}
+
+int pauseDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    return lock ? makeServiceBackend(nameOf(daemon))->pause() : -1;
+}
+
+ServiceState daemonState(Daemon daemon) {
+    return makeServiceBackend(nameOf(daemon))->state();
+}
+
+} // namespace velt

@@ -1,0 +1,45 @@
+#include "standalone/services/service_backend.h"
+
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/services/supervise_backend.h"
+#include "standalone/services/systemd_backend.h"
+
+#include <system_error>
+
+namespace velt {
+
+std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon) {
+    // Units are the machine's, so an installation below another root keeps its daemons to itself.
+    std::error_code error;
+    const bool systemdRuns = std::filesystem::is_directory("/run/systemd/system", error);
+    if (systemdRuns && statePath("/") == "/") {
+        return std::make_unique<SystemdBackend>(daemon);
+    }
+    return std::make_unique<SuperviseBackend>(daemon);
+}
+
+std::filesystem::path runDirectory() {
+    const std::filesystem::path directory = statePath("/run/velt");
+    std::error_code error;
+    std::filesystem::create_directories(directory, error);
+    if (error) {
+        fail(ErrorNumber::store,
+             "The folder " + directory.string() + " cannot be made: " + error.message() + ".");
+        return {};
+    }
+    return directory;
+}
+
+std::string daemonTitle(const std::string& daemon) {
+    return daemon == "sftp" ? "The SFTP daemon" : "The FTP daemon";
+}
+
+int failedToStart(const std::string& daemon, std::string reason) {
+    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
+        reason.pop_back(); // daemons end their sentences as they like
+    }
+    return fail(ErrorNumber::daemon, daemonTitle(daemon) + " does not start: " + reason + ".");
+}
+
+} // namespace velt

@@ -1,0 +1,116 @@
+// The contract's operations on the FTP settings.
+#include "ftp/ftp_library.h"
+#include "platform/core.h"
+#include "standalone/core/boundary.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/key_value_file.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/settings/settings_files.h"
+#include "standalone/settings/settings_store.h"
+
+namespace velt {
+
+namespace {
+
+template<class Value> int readSetting(Value FtpSettings::*setting) {
+    return atBoundary([&] {
+        const auto settings = loadFtpFile();
+        return settings ? static_cast<int>((*settings).*setting) : -1;
+    });
+}
+
+template<class Value> int writeSetting(Value FtpSettings::*setting, Value value) {
+    return atBoundary(
+        [&] { return changeFtpSettings([&](FtpSettings& settings) { settings.*setting = value; }); });
+}
+
+int noPlaceFor(const char* what) {
+    return fail(ErrorNumber::invalid, std::string("There is no place for ") + what + ".");
+}
+
+int writeSystemInformation(std::string_view key, std::string_view value) {
+    const StateLock lock;
+    if (!lock)
+        return -1;
+    return perform(Effect::store, "system information",
+                   [&] { return writeKeyValue(statePath(systemInformationFile), key, value); });
+}
+
+} // namespace
+
+} // namespace velt
+
+int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out) {
+    if (out == nullptr)
+        return velt::noPlaceFor("the FTP settings");
+    return velt::atBoundary([&] {
+        const auto settings = velt::loadFtpFile();
+        if (!settings)
+            return -1;
+        *out = settings->record;
+        return 0;
+    });
+}
+
+int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf) {
+    return velt::writeSetting(&velt::FtpSettings::record, conf);
+}
+
+int VELTFTPTimeOutGet(void) {
+    return velt::readSetting(&velt::FtpSettings::timeout);
+}
+
+int VELTFTPTimeOutSet(int timeout) {
+    return velt::writeSetting(&velt::FtpSettings::timeout, timeout);
+}
+
+int VELTFTPUseUTF8Get(void) {
+    return velt::readSetting(&velt::FtpSettings::useUtf8);
+}
+
+int VELTFTPUseUTF8Set(int enable) {
+    return velt::writeSetting(&velt::FtpSettings::useUtf8, enable != 0);
+}
+
+int VELTFTPFIPSEnabledGet(void) {
+    return velt::readSetting(&velt::FtpSettings::fipsOnly);
+}
+
+int VELTFTPFIPSEnabledSet(int enable) {
+    return velt::writeSetting(&velt::FtpSettings::fipsOnly, enable != 0);
+}
+
+int VELTFTPASCIIEnabledGet(void) {
+    return velt::readSetting(&velt::FtpSettings::ascii);
+}
+
+int VELTFTPASCIIEnabledSet(int enable) {
+    return velt::writeSetting(&velt::FtpSettings::ascii, enable != 0);
+}
+
+int VELTFTPUmaskEnabledGet(void) {
+    return velt::readSetting(&velt::FtpSettings::umask);
+}
+
+int VELTFTPUmaskEnabledSet(bool enable) {
+    return velt::writeSetting(&velt::FtpSettings::umask, enable);
+}
+
+int VELTFTPDefaultPassivePortGet(VELT_FTP_PORT_RANGE* out) {
+    if (out == nullptr)
+        return velt::noPlaceFor("the default passive range");
+    *out = velt::defaultPassiveRange;
+    return 0;
+}
+
+int VLIBCINFOSetKeyValue(const char* key, const char* value) {
+    if (key == nullptr || value == nullptr)
+        return velt::fail(velt::ErrorNumber::invalid, "There is no key or no value to write.");
+    return velt::atBoundary([&] {
+        if (key == velt::externalAddressKey)
+            return velt::changeExternalAddress(value);
+        return velt::writeSystemInformation(key, value);
+    });
+}

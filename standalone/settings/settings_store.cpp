@@ -1,0 +1,136 @@
+#include "standalone/settings/settings_store.h"
+
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/key_value_file.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/settings/candidate.h"
+#include "standalone/settings/settings_files.h"
+
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+
+namespace velt {
+
+namespace {
+
+constexpr mode_t settingsMode = 0644;
+
+template<class Settings>
+using Parse = std::optional<Settings> (*)(const std::string& file, std::string_view contents);
+
+template<class Settings>
+std::optional<Settings> loadFile(std::string_view name, Parse<Settings> parse, const Settings& defaults) {
+    const auto path = statePath(name);
+    const auto contents = readFile(path);
+    if (contents)
+        return parse(path.string(), *contents);
+    if (errno == ENOENT)
+        return defaults;
+    fail(ErrorNumber::store,
+         "Cannot read the settings file " + path.string() + ": " + std::strerror(errno) + ".");
+    return std::nullopt;
+}
+
+int storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
+    return perform(Effect::store, subject,
+                   [&] { return replaceFile(statePath(name), contents, settingsMode); });
+}
+
+int storeFtpFile(const FtpSettings& settings) {
+    return storeFile("ftp settings", ftpSettingsFile, formatFtpSettings(settings));
+}
+
+int storeSftpFile(const SftpSettings& settings) {
+    return storeFile("sftp settings", sftpSettingsFile, formatSftpSettings(settings));
+}
+
+bool isMissing(std::string_view name) {
+    return ::access(statePath(name).c_str(), F_OK) != 0;
+}
+
+} // namespace
+
+FtpSettings defaultFtpSettings() {
+    FtpSettings settings;
+    std::strcpy(settings.record.portnum, "21");
+    settings.record.support_utf8 = 1;
+    return settings;
+}
+
+std::optional<FtpSettings> loadFtpFile() {
+    return loadFile<FtpSettings>(ftpSettingsFile, parseFtpSettings, defaultFtpSettings());
+}
+
+std::optional<FtpSettings> loadFtpSettings() {
+    auto settings = loadFtpFile();
+    if (!settings)
+        return std::nullopt;
+    const auto file = statePath(systemInformationFile);
+    if (readKeyValue(file, externalAddressKey, settings->externalAddress) < 0)
+        return std::nullopt;
+    if (!settings->externalAddress.empty() && !isIPv4Address(settings->externalAddress)) {
+        fail(ErrorNumber::damaged, "File " + file.string() + ": the value of ftp_ext_ip is no IPv4 address.");
+        return std::nullopt;
+    }
+    return settings;
+}
+
+std::optional<SftpSettings> loadSftpSettings() {
+    return loadFile<SftpSettings>(sftpSettingsFile, parseSftpSettings, SftpSettings());
+}
+
+int changeFtpSettings(const std::function<void(FtpSettings&)>& change) {
+    const StateLock lock;
+    if (!lock)
+        return -1;
+    auto settings = loadFtpSettings();
+    if (!settings)
+        return -1;
+    change(*settings);
+    if (checkFtpSettings(*settings) < 0 || testFtpCandidate(*settings) < 0)
+        return -1;
+    return storeFtpFile(*settings);
+}
+
+int changeSftpSettings(const std::function<void(SftpSettings&)>& change) {
+    const StateLock lock;
+    if (!lock)
+        return -1;
+    auto settings = loadSftpSettings();
+    if (!settings)
+        return -1;
+    change(*settings);
+    if (checkSftpSettings(*settings) < 0 || testSftpCandidate(*settings) < 0)
+        return -1;
+    return storeSftpFile(*settings);
+}
+
+int changeExternalAddress(const std::string& address) {
+    const StateLock lock;
+    if (!lock)
+        return -1;
+    auto settings = loadFtpFile();
+    if (!settings)
+        return -1;
+    settings->externalAddress = address;
+    if (checkFtpSettings(*settings) < 0 || testFtpCandidate(*settings) < 0)
+        return -1;
+    return perform(Effect::store, "external address", [&] {
+        return writeKeyValue(statePath(systemInformationFile), externalAddressKey, address);
+    });
+}
+
+int writeMissingSettings() {
+    const StateLock lock;
+    if (!lock)
+        return -1;
+    if (isMissing(ftpSettingsFile) && storeFtpFile(defaultFtpSettings()) < 0)
+        return -1;
+    return isMissing(sftpSettingsFile) ? storeSftpFile(SftpSettings()) : 0;
+}
+
+} // namespace velt

@@ -1,0 +1,27 @@
+// Changing the stored settings.
+#ifndef VELT_STANDALONE_SETTINGS_SETTINGS_STORE_H
+#define VELT_STANDALONE_SETTINGS_SETTINGS_STORE_H
+
+#include "standalone/settings/settings.h"
+
+#include <functional>
+#include <optional>
+
+namespace velt {
+
+/// The FTP settings without the external address, so that a damaged one can be read past and repaired; else
+/// as loadFtpSettings.
+std::optional<FtpSettings> loadFtpFile();
+
+/// Reads the settings, lets `change` change them, and stores them after the checks here and the daemon's own
+/// test have passed, all under the StateLock. Negative on failure, with the last error set; nothing is stored
+/// then.
+int changeFtpSettings(const std::function<void(FtpSettings&)>& change);
+int changeSftpSettings(const std::function<void(SftpSettings&)>& change);
+
+/// Stores the external address in the same manner.
+int changeExternalAddress(const std::string& address);
+
+} // namespace velt
+
+#endif

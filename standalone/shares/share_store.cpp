@@ -1,0 +1,81 @@
+#include "standalone/shares/share_store.h"
+
+#include "standalone/accounts/file_stamp.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/shares/share_file.h"
+
+#include <cerrno>
+#include <cstring>
+#include <mutex>
+
+namespace velt {
+
+namespace {
+
+constexpr std::string_view shareFile = "/etc/velt/shares.json";
+
+// A listing of chroot rules looks a share up for each rule.
+struct Cache {
+    std::mutex mutex;
+    std::filesystem::path path;
+    FileStamp stamp;
+    std::vector<ShareEntry> shares;
+};
+
+Cache& cache() {
+    static Cache instance;
+    return instance;
+}
+
+std::optional<std::vector<ShareEntry>> readShares(const std::filesystem::path& path) {
+    const std::optional<std::string> text = readFile(path);
+    if (!text && errno == ENOENT) {
+        return std::vector<ShareEntry>{};
+    }
+    if (!text) {
+        fail(ErrorNumber::store, path.string() + " cannot be read: " + std::strerror(errno) + ".");
+        return std::nullopt;
+    }
+    std::string flaw;
+    std::optional<std::vector<ShareEntry>> shares = parseShares(*text, flaw);
+    if (!shares) {
+        fail(ErrorNumber::damaged, path.string() + " is damaged: " + flaw + ".");
+    }
+    return shares;
+}
+
+} // namespace
+
+std::optional<std::vector<ShareEntry>> allShares() {
+    const std::filesystem::path path = statePath(shareFile);
+    Cache& known = cache();
+    const std::lock_guard lock(known.mutex);
+    const FileStamp stamp = FileStamp::of(path);
+    if (path == known.path && stamp == known.stamp) {
+        return known.shares;
+    }
+    std::optional<std::vector<ShareEntry>> shares = readShares(path);
+    if (shares) {
+        known.path = path;
+        known.stamp = stamp;
+        known.shares = *shares;
+    }
+    return shares;
+}
+
+int saveShares(const std::vector<ShareEntry>& shares) {
+    if (const std::optional<std::string> flaw = flawOf(shares)) {
+        return fail(ErrorNumber::invalid, "The shares cannot be stored: " + *flaw + ".");
+    }
+    const StateLock lock;
+    if (!lock) {
+        return -1;
+    }
+    return perform(Effect::store, "shares",
+                   [&shares] { return replaceFile(statePath(shareFile), renderShares(shares), 0644); });
+}
+
+} // namespace velt

@@ -1,0 +1,18 @@
+// The keys by which the SFTP service proves who it is.
+#ifndef VELT_STANDALONE_SSHD_HOST_KEYS_H
+#define VELT_STANDALONE_SSHD_HOST_KEYS_H
+
+#include <filesystem>
+#include <optional>
+#include <vector>
+
+namespace velt {
+
+/// The private host keys, Ed25519 and RSA, below "/var/lib/velt/ssh" of the state root; a missing one is made. They are not those of
+/// an SSH service that the server may run besides. Nothing, with the last error set, when a key cannot be made.
+/// Thread-safe.
+std::optional<std::vector<std::filesystem::path>> hostKeys();
+
+} // namespace velt
+
+#endif

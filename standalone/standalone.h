@@ -1,0 +1,106 @@
+// What the platform library offers the program that loads the module over it, beside the contract.
+//
+// A host, at its start: openState, the subscriptions, startEnabledServices. Then, for each request, on the
+// thread that serves it: setRequestActor, clearLastError, the module's entry function, and after a failure
+// lastErrorSentence or lastPortConflict for the answer.
+//
+// Functions with an int result return a negative one on failure, with the last error set. Unless it says
+// otherwise a function may be called from any thread.
+#ifndef VELT_STANDALONE_STANDALONE_H
+#define VELT_STANDALONE_STANDALONE_H
+
+#include "standalone/core/effects.h"
+#include "standalone/core/last_error.h"
+
+#include <array>
+#include <chrono>
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace velt {
+
+/// Chooses the root folder of all stored state ("/" in production), and writes the default settings where
+/// there are none yet: both services off. Settings that are there already stay, also when they are damaged;
+/// whoever reads those is told. To be called once, before any other operation of the library and while the
+/// process has one thread only.
+int openState(const std::filesystem::path& root);
+
+/// Makes the daemons follow the stored settings after a boot: starts what is enabled. Blocks until each
+/// daemon accepts connections or has failed. One that fails does not keep the others from starting; the
+/// result is then negative.
+int startEnabledServices();
+
+/// Names who makes the request that this thread serves now, and the address it came from, for the entries of
+/// the administrator log. Holds for this thread until the next call; two empty texts: the system itself.
+void setRequestActor(const std::string& actor, const std::string& address);
+
+/// A system event, as it was announced.
+struct SystemEvent {
+    std::chrono::system_clock::time_point time;
+    std::string name; ///< "velt.service.action"
+    std::map<std::string, std::string> parameters;
+    std::string actor; ///< "" for the system itself
+    std::string address;
+};
+
+/// An entry of the administrator log, as it was written.
+struct LogEntry {
+    std::int64_t id = 0;                        ///< grows with each entry; none is used twice
+    std::chrono::system_clock::time_point time; ///< in whole milliseconds
+    int category = 0;
+    int level = 0;
+    unsigned event = 0;               ///< 0x11B000nn
+    std::array<std::string, 4> texts; ///< "" for those that the event does not use
+    std::string sentence;             ///< the event's sentence with the texts filled in
+    std::string actor;                ///< "" for the system itself
+    std::string address;
+};
+
+using EventSubscriber = std::function<void(const SystemEvent&)>;
+using LogSubscriber = std::function<void(const LogEntry&)>;
+using Subscription = std::uint64_t; ///< never 0
+
+/// Calls the subscriber with every event (log entry) from now on, on the thread that raised it, after it has
+/// been written down. What the subscriber takes is added to the request's time, so it hands the event on and
+/// returns. It may be called by several threads at once; what it throws is dropped.
+Subscription subscribeEvents(EventSubscriber subscriber);
+Subscription subscribeLog(LogSubscriber subscriber);
+
+/// Ends a subscription of either kind. When it returns, the subscriber is not running and is not called
+/// again; a subscriber must not end its own subscription. An unknown one is ignored.
+void unsubscribe(Subscription subscription);
+
+/// Which entries of the administrator log are wanted; what is not set does not narrow.
+struct LogFilter {
+    std::optional<std::chrono::system_clock::time_point> since; ///< of this moment or later
+    std::optional<unsigned> event;
+    std::optional<std::string> actor;     ///< exactly this text
+    std::optional<std::int64_t> beforeId; ///< older than this entry: the last id of a page leads to the next
+    int limit = 100;                      ///< 1 to 1000
+};
+
+/// The newest entries that the filter lets through, newest first. Nothing, with the last error set, when the log
+/// cannot be read.
+std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter);
+
+/// Who holds a port.
+struct PortConflict {
+    int port = 0;       ///< 0: there was no conflict
+    std::string holder; ///< in words: "the SFTP service", "nginx (process 812)"
+};
+
+/// What the calling thread's last WebUtils::IsPortConflict found.
+PortConflict lastPortConflict();
+
+// The calling thread's last error in a sentence: lastErrorSentence, clearLastError
+// (standalone/core/last_error.h). Listing effects instead of doing them, failing or timing them:
+// setEffectHook (standalone/core/effects.h).
+
+} // namespace velt
+
+#endif

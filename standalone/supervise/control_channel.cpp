@@ -1,0 +1,205 @@
+#include "standalone/supervise/control_channel.h"
+
+#include <fcntl.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/time.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <array>
+#include <charconv>
+#include <cstring>
+#include <string_view>
+#include <utility>
+
+namespace velt {
+namespace {
+
+constexpr std::size_t largestMessage = 64 * 1024;
+constexpr std::array<std::pair<Command, std::string_view>, 3> commandNames{{
+    {Command::start, "start"},
+    {Command::pause, "pause"},
+    {Command::stop, "stop"},
+}};
+
+/// The socket's address by way of the folder's descriptor: a state root may lie deeper than the 107 bytes that an
+/// address has room for.
+class SocketAddress {
+public:
+    SocketAddress(const std::filesystem::path& directory, const std::string& service)
+        : folder_(::open(directory.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {
+        const std::string path = "/proc/self/fd/" + std::to_string(folder_) + "/" + service + ".sock";
+        address_.sun_family = AF_UNIX;
+        path.copy(address_.sun_path, sizeof address_.sun_path - 1);
+    }
+    ~SocketAddress() {
+        if (folder_ >= 0) {
+            ::close(folder_);
+        }
+    }
+    SocketAddress(const SocketAddress&) = delete;
+    SocketAddress& operator=(const SocketAddress&) = delete;
+
+    const sockaddr* get() const { return reinterpret_cast<const sockaddr*>(&address_); }
+    const char* path() const { return address_.sun_path; }
+    static socklen_t size() { return sizeof(sockaddr_un); }
+
+private:
+    int folder_;
+    sockaddr_un address_{};
+};
+
+void setTimeouts(int descriptor, std::chrono::milliseconds limit) {
+    timeval time{};
+    time.tv_sec = limit.count() / 1000;
+    time.tv_usec = (limit.count() % 1000) * 1000;
+    ::setsockopt(descriptor, SOL_SOCKET, SO_RCVTIMEO, &time, sizeof time);
+    ::setsockopt(descriptor, SOL_SOCKET, SO_SNDTIMEO, &time, sizeof time);
+}
+
+std::optional<std::string> receiveMessage(int descriptor) {
+    std::string message(largestMessage, '\0');
+    const ssize_t length = ::recv(descriptor, message.data(), message.size(), 0);
+    if (length <= 0) {
+        return std::nullopt;
+    }
+    message.resize(static_cast<std::size_t>(length));
+    return message;
+}
+
+bool maySpeak(int descriptor) {
+    ucred peer{};
+    socklen_t size = sizeof peer;
+    return ::getsockopt(descriptor, SOL_SOCKET, SO_PEERCRED, &peer, &size) == 0 &&
+           (peer.uid == 0 || peer.uid == ::geteuid());
+}
+
+std::vector<std::string> splitFields(const std::string& message) {
+    std::vector<std::string> fields;
+    std::size_t begin = 0;
+    for (std::size_t end = message.find('\0'); end != std::string::npos; end = message.find('\0', begin)) {
+        fields.push_back(message.substr(begin, end - begin));
+        begin = end + 1;
+    }
+    return fields;
+}
+
+} // namespace
+
+std::string encodeRequest(const ControlRequest& request) {
+    std::string message;
+    const auto add = [&message](std::string_view field) { message.append(field).push_back('\0'); };
+    for (const auto& [command, name] : commandNames) {
+        if (command == request.command) {
+            add(name);
+        }
+    }
+    if (request.command == Command::start) {
+        add(request.order.configurationHash);
+        add(std::to_string(request.order.ports.size()));
+        for (const int port : request.order.ports) {
+            add(std::to_string(port));
+        }
+        for (const std::string& argument : request.order.arguments) {
+            add(argument);
+        }
+    }
+    return message;
+}
+
+std::optional<ControlRequest> decodeRequest(const std::string& message) {
+    const std::vector<std::string> fields = splitFields(message);
+    ControlRequest request;
+    bool known = false;
+    for (const auto& [command, name] : commandNames) {
+        if (!fields.empty() && fields[0] == name) {
+            request.command = command;
+            known = true;
+        }
+    }
+    if (!known || request.command != Command::start) {
+        return known ? std::optional(request) : std::nullopt;
+    }
+    const auto number = [&fields](std::size_t index) {
+        int value = -1;
+        if (index < fields.size()) {
+            std::from_chars(fields[index].data(), fields[index].data() + fields[index].size(), value);
+        }
+        return value;
+    };
+    constexpr std::size_t firstPort = 3;
+    const int portCount = number(2);
+    if (portCount < 0 || fields.size() <= firstPort + static_cast<std::size_t>(portCount)) {
+        return std::nullopt;
+    }
+    const std::size_t firstArgument = firstPort + static_cast<std::size_t>(portCount);
+    request.order.configurationHash = fields[1];
+    for (std::size_t index = firstPort; index < firstArgument; ++index) {
+        request.order.ports.push_back(number(index));
+    }
+    request.order.arguments.assign(fields.begin() + static_cast<std::ptrdiff_t>(firstArgument), fields.end());
+    return request;
+}
+
+ControlListener::ControlListener(std::filesystem::path directory, std::string service)
+    : directory_(std::move(directory)), service_(std::move(service)) {
+    const SocketAddress address(directory_, service_);
+    ::unlink(address.path());
+    descriptor_ = ::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0);
+    // The umask of a supervisor lets nobody but its own user through; who speaks is checked all the same.
+    if (descriptor_ < 0 || ::bind(descriptor_, address.get(), SocketAddress::size()) != 0 ||
+        ::chmod(address.path(), S_IRUSR | S_IWUSR) != 0 || ::listen(descriptor_, 8) != 0) {
+        ::close(descriptor_);
+        descriptor_ = -1;
+    }
+}
+
+ControlListener::~ControlListener() {
+    if (descriptor_ >= 0) {
+        ::close(descriptor_);
+        ::unlink(SocketAddress(directory_, service_).path());
+    }
+}
+
+void ControlListener::serve(const std::function<std::string(const ControlRequest&)>& handle) {
+    const int peer = ::accept4(descriptor_, nullptr, nullptr, SOCK_CLOEXEC);
+    if (peer < 0) {
+        return;
+    }
+    setTimeouts(peer, std::chrono::seconds(1)); // one who connects and says nothing holds nobody up for long
+    if (maySpeak(peer)) {
+        std::string answer = "the request was not understood";
+        if (const auto message = receiveMessage(peer)) {
+            const auto request = decodeRequest(*message);
+            answer = request ? handle(*request) : answer;
+        }
+        answer.insert(0, answer.empty() ? "ok" : "failed ");
+        ::send(peer, answer.data(), answer.size(), MSG_NOSIGNAL);
+    }
+    ::close(peer);
+}
+
+std::optional<std::string> askSupervisor(const std::filesystem::path& directory, const std::string& service,
+                                         const ControlRequest& request, std::chrono::milliseconds limit) {
+    const SocketAddress address(directory, service);
+    const int descriptor = ::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0);
+    if (descriptor < 0) {
+        return std::nullopt;
+    }
+    setTimeouts(descriptor, limit);
+    const std::string message = encodeRequest(request);
+    std::optional<std::string> answer;
+    if (::connect(descriptor, address.get(), SocketAddress::size()) == 0 &&
+        ::send(descriptor, message.data(), message.size(), MSG_NOSIGNAL) >= 0) {
+        answer = receiveMessage(descriptor);
+    }
+    ::close(descriptor);
+    if (!answer) {
+        return std::nullopt;
+    }
+    constexpr std::string_view failure = "failed ";
+    return answer->starts_with(failure) ? answer->substr(failure.size()) : std::string();
+}
+
+} // namespace velt

@@ -1,0 +1,193 @@
+#include "standalone/supervise/daemon_process.h"
+
+#include "standalone/ports/listening_sockets.h"
+#include "standalone/supervise/last_words.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <cstring>
+#include <string_view>
+#include <utility>
+
+namespace velt {
+namespace {
+
+constexpr std::size_t keptLines = 5;
+constexpr std::size_t longestLine = 400;
+
+class SpawnSetup {
+public:
+    explicit SpawnSetup(int output) {
+        posix_spawn_file_actions_init(&actions);
+        posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+        posix_spawn_file_actions_adddup2(&actions, output, STDOUT_FILENO);
+        posix_spawn_file_actions_adddup2(&actions, output, STDERR_FILENO);
+        // The supervisor blocks the signals that it reads from a descriptor; the daemon must not inherit that.
+        posix_spawnattr_init(&attributes);
+        sigset_t none;
+        sigemptyset(&none);
+        sigset_t all;
+        sigfillset(&all);
+        posix_spawnattr_setsigmask(&attributes, &none);
+        posix_spawnattr_setsigdefault(&attributes, &all);
+        posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+    }
+    ~SpawnSetup() {
+        posix_spawnattr_destroy(&attributes);
+        posix_spawn_file_actions_destroy(&actions);
+    }
+    SpawnSetup(const SpawnSetup&) = delete;
+    SpawnSetup& operator=(const SpawnSetup&) = delete;
+
+    posix_spawn_file_actions_t actions{};
+    posix_spawnattr_t attributes{};
+};
+
+/// The ports as people write them: "2121, 2122".
+std::string listPorts(const std::vector<int>& ports) {
+    std::string text;
+    for (const int port : ports) {
+        text += (text.empty() ? "" : ", ") + std::to_string(port);
+    }
+    return text;
+}
+
+} // namespace
+
+DaemonProcess::DaemonProcess() {
+    std::array<int, 2> ends{-1, -1};
+    if (::pipe2(ends.data(), O_CLOEXEC) == 0) {
+        readEnd_ = ends[0];
+        writeEnd_ = ends[1];
+        // Only the reading side: a daemon does not expect its standard error to refuse a line.
+        ::fcntl(readEnd_, F_SETFL, O_NONBLOCK);
+    }
+}
+
+DaemonProcess::~DaemonProcess() {
+    if (readEnd_ >= 0) {
+        ::close(readEnd_);
+        ::close(writeEnd_);
+    }
+}
+
+std::string DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadline) {
+    readOutput(); // what a former daemon left says nothing about this one
+    lastLines_.clear();
+    partialLine_.clear();
+    std::string reason = spawn(order);
+    return reason.empty() ? waitUntilListening(order, deadline) : reason;
+}
+
+std::string DaemonProcess::spawn(const DaemonOrder& order) {
+    if (order.arguments.empty()) {
+        return "there is no program to start";
+    }
+    std::vector<char*> arguments;
+    for (const std::string& argument : order.arguments) {
+        arguments.push_back(const_cast<char*>(argument.c_str()));
+    }
+    arguments.push_back(nullptr);
+    std::string path = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
+    std::string language = "LANG=C.UTF-8";
+    std::array<char*, 3> environment{path.data(), language.data(), nullptr};
+    SpawnSetup setup(writeEnd_);
+    pid_t pid = 0;
+    const int error = ::posix_spawn(&pid, arguments[0], &setup.actions, &setup.attributes, arguments.data(),
+                                    environment.data());
+    if (error != 0) {
+        return order.arguments[0] + " cannot be started: " + std::strerror(error);
+    }
+    // A child that has ended already cannot be identified any more, but keeps its pid until it is reaped.
+    id_ = identifyProcess(pid).value_or(ProcessId{pid, 0});
+    return "";
+}
+
+std::string DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::time_point deadline) {
+    for (;;) {
+        readOutput();
+        int status = 0;
+        if (::waitpid(id_.pid, &status, WNOHANG) == id_.pid) {
+            return ended(status);
+        }
+        if (std::all_of(order.ports.begin(), order.ports.end(),
+                        [this](int port) { return listensOn(id_.pid, port); })) {
+            return "";
+        }
+        if (Clock::now() >= deadline) {
+            ::kill(id_.pid, SIGKILL); // our child, not reaped yet: the pid is its own
+            ::waitpid(id_.pid, &status, 0);
+            readOutput();
+            id_ = {};
+            const std::string words = takeLastWords();
+            return "it did not listen on port " + listPorts(order.ports) + " in time" +
+                   (words.empty() ? "" : ": " + words);
+        }
+        pollfd output{readEnd_, POLLIN, 0};
+        ::poll(&output, 1, 2);
+    }
+}
+
+std::string DaemonProcess::ended(int waitStatus) {
+    readOutput();
+    id_ = {};
+    std::string words = takeLastWords();
+    if (WIFSIGNALED(waitStatus)) { // then its words were about something else
+        return "it was ended by signal " + std::to_string(WTERMSIG(waitStatus));
+    }
+    return words.empty() ? "it ended with status " + std::to_string(WEXITSTATUS(waitStatus)) : words;
+}
+
+std::string DaemonProcess::takeLastWords() {
+    if (!partialLine_.empty()) {
+        takeLine(std::exchange(partialLine_, {}));
+    }
+    std::string lines;
+    for (const std::string& line : lastLines_) {
+        lines += line + '\n';
+    }
+    return lastWords(lines);
+}
+
+void DaemonProcess::readOutput() {
+    std::array<char, 4096> buffer{};
+    for (;;) {
+        const ssize_t length = ::read(readEnd_, buffer.data(), buffer.size());
+        if (length <= 0) {
+            return;
+        }
+        for (const char character : std::string_view(buffer.data(), static_cast<std::size_t>(length))) {
+            if (character == '\n') {
+                takeLine(std::exchange(partialLine_, {}));
+            } else if (partialLine_.size() < longestLine) {
+                partialLine_ += character;
+            } else if (partialLine_.size() == longestLine) {
+                partialLine_ += "…"; // so that nobody takes it for the whole; a full stop would be taken off
+            }
+        }
+    }
+}
+
+void DaemonProcess::takeLine(std::string line) {
+    // The lines end in state files, logs and answers, where control characters have no business.
+    std::erase_if(line, [](unsigned char character) { return character < 0x20 || character == 0x7f; });
+    if (line.empty()) {
+        return;
+    }
+    ::syslog(LOG_NOTICE, "%s", line.c_str());
+    lastLines_.push_back(std::move(line));
+    if (lastLines_.size() > keptLines) {
+        lastLines_.pop_front();
+    }
+}
+
+} // namespace velt

@@ -1,0 +1,112 @@
+// velt-supervise: keeps one daemon running.
+//
+//     velt-supervise DIRECTORY SERVICE CONFIGURATION PORTS PROGRAM [ARGUMENT...]
+//
+// DIRECTORY holds the state file, the lock and the control socket; PORTS are separated by commas; CONFIGURATION
+// identifies what the daemon is started for. The process that was started ends at once; its
+// child goes on and writes "ready", or "failed" and the reason, to descriptor 3.
+
+#include "standalone/supervise/supervisor.h"
+
+#include <fcntl.h>
+#include <linux/close_range.h>
+#include <sys/stat.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <charconv>
+#include <csignal>
+#include <cstdio>
+#include <cstring>
+#include <exception>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace {
+
+constexpr int reportDescriptor = 3;
+
+std::optional<std::vector<int>> parsePorts(std::string_view text) {
+    std::vector<int> ports;
+    while (!text.empty()) {
+        int port = 0;
+        const auto [rest, problem] = std::from_chars(text.data(), text.data() + text.size(), port);
+        if (problem != std::errc{} || port < 1 || port > 65535) {
+            return std::nullopt;
+        }
+        ports.push_back(port);
+        text.remove_prefix(static_cast<std::size_t>(rest - text.data()));
+        if (text.starts_with(',')) {
+            text.remove_prefix(1);
+        } else if (!text.empty()) {
+            return std::nullopt;
+        }
+    }
+    return ports;
+}
+
+void report(const std::string& reason) {
+    const std::string text = reason.empty() ? "ready" : "failed " + reason;
+    if (::write(reportDescriptor, text.data(), text.size()) < 0) {
+        ::syslog(LOG_WARNING, "nobody heard: %s", text.c_str());
+    }
+    ::close(reportDescriptor);
+}
+
+/// Leaves everything that came from the process which started this one, and returns in the child.
+void detach() {
+    const pid_t child = ::fork();
+    if (child != 0) {
+        ::_exit(child < 0 ? 1 : 0);
+    }
+    ::setsid();
+    ::umask(S_IWGRP | S_IWOTH);
+    if (::chdir("/") != 0) {
+        ::syslog(LOG_WARNING, "cannot leave the working directory: %s", std::strerror(errno));
+    }
+    ::close_range(reportDescriptor + 1, ~0U, 0);
+    ::fcntl(reportDescriptor, F_SETFD, FD_CLOEXEC);
+    const int null = ::open("/dev/null", O_RDWR | O_CLOEXEC);
+    for (const int standard : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
+        ::dup2(null, standard);
+    }
+    ::close(null);
+    ::signal(SIGPIPE, SIG_IGN);
+}
+
+int supervise(const std::string& directory, const std::string& service, const velt::DaemonOrder& order) {
+    velt::Supervisor supervisor(directory, service);
+    const std::string reason = supervisor.begin(order);
+    report(reason);
+    if (!reason.empty()) {
+        return 1;
+    }
+    supervisor.run();
+    return 0;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    constexpr int fewestArguments = 6;
+    const auto ports = argc >= fewestArguments ? parsePorts(argv[4]) : std::nullopt;
+    if (!ports) {
+        std::fputs("usage: velt-supervise DIRECTORY SERVICE CONFIGURATION PORTS PROGRAM [ARGUMENT...]\n",
+                   stderr);
+        return 2;
+    }
+    velt::DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
+    // What the daemons write goes there as well, the reasons of refused logins among it, so it is under their names.
+    const std::string ident =
+        std::string_view(argv[2]) == "sftp" ? "velt-sftpd" : std::string("velt-") + argv[2];
+    ::openlog(ident.c_str(), LOG_PID, LOG_DAEMON);
+    detach();
+    try {
+        return supervise(argv[1], argv[2], order);
+    } catch (const std::exception& error) {
+        ::syslog(LOG_CRIT, "%s", error.what());
+        return 1;
+    }
+}

@@ -1,0 +1,163 @@
+#include "standalone/supervise/service_state.h"
+
+#include "standalone/ports/listening_sockets.h"
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstdio>
+#include <fstream>
+#include <sstream>
+#include <string_view>
+#include <utility>
+
+namespace velt {
+namespace {
+
+constexpr std::string_view firstLine = "velt-supervise 2";
+constexpr std::string_view bootKey = "boot ";
+
+constexpr std::array<std::pair<RunState, std::string_view>, 3> stateNames{{
+    {RunState::running, "running"},
+    {RunState::paused, "paused"},
+    {RunState::failed, "failed"},
+}};
+
+std::string_view nameOf(RunState state) {
+    for (const auto& [value, name] : stateNames) {
+        if (value == state) {
+            return name;
+        }
+    }
+    return "stopped";
+}
+
+RunState stateNamed(std::string_view text) {
+    for (const auto& [value, name] : stateNames) {
+        if (name == text) {
+            return value;
+        }
+    }
+    return RunState::stopped;
+}
+
+std::string oneLine(std::string text) {
+    std::replace(text.begin(), text.end(), '\n', ' ');
+    return text;
+}
+
+ProcessId readProcess(std::istream& fields) {
+    ProcessId process;
+    fields >> process.pid >> process.startTime;
+    return fields ? process : ProcessId{};
+}
+
+void takeLine(const std::string& line, ServiceState& state) {
+    std::istringstream fields(line);
+    std::string key;
+    fields >> key >> std::ws;
+    if (key == "state") {
+        std::string name;
+        fields >> name;
+        state.state = stateNamed(name);
+    } else if (key == "supervisor") {
+        state.supervisor = readProcess(fields);
+    } else if (key == "daemon") {
+        state.daemon = readProcess(fields);
+    } else if (key == "session") {
+        state.sessions.push_back(readProcess(fields));
+    } else if (key == "port") {
+        int port = 0;
+        fields >> port;
+        state.ports.push_back(port);
+    } else if (key == "configuration") {
+        std::getline(fields, state.configurationHash);
+    } else if (key == "reason") {
+        std::getline(fields, state.reason);
+    }
+}
+
+std::string render(const ServiceState& state) {
+    std::ostringstream text;
+    const auto processLine = [&text](std::string_view key, const ProcessId& process) {
+        if (process) {
+            text << key << ' ' << process.pid << ' ' << process.startTime << '\n';
+        }
+    };
+    text << firstLine << '\n' << bootKey << bootId() << '\n' << "state " << nameOf(state.state) << '\n';
+    processLine("supervisor", state.supervisor);
+    processLine("daemon", state.daemon);
+    text << "configuration " << oneLine(state.configurationHash) << '\n';
+    for (const int port : state.ports) {
+        text << "port " << port << '\n';
+    }
+    for (const ProcessId& session : state.sessions) {
+        processLine("session", session);
+    }
+    if (!state.reason.empty()) {
+        text << "reason " << oneLine(state.reason) << '\n';
+    }
+    return text.str();
+}
+
+} // namespace
+
+std::filesystem::path stateFile(const std::filesystem::path& directory, const std::string& service) {
+    return directory / (service + ".state");
+}
+
+std::filesystem::path lockFile(const std::filesystem::path& directory, const std::string& service) {
+    return directory / (service + ".lock");
+}
+
+std::optional<ServiceState> readServiceState(const std::filesystem::path& file) {
+    std::ifstream input(file);
+    std::string line;
+    if (!std::getline(input, line) || line != firstLine) {
+        return std::nullopt;
+    }
+    if (!std::getline(input, line) || line != std::string(bootKey) + bootId()) {
+        return std::nullopt;
+    }
+    ServiceState state;
+    while (std::getline(input, line)) {
+        takeLine(line, state);
+    }
+    return state;
+}
+
+bool writeServiceState(const std::filesystem::path& file, const ServiceState& state) {
+    std::filesystem::path fresh = file;
+    fresh += ".new";
+    {
+        std::ofstream output(fresh, std::ios::trunc);
+        output << render(state);
+        if (!output.flush()) {
+            return false;
+        }
+    }
+    // Without fsync: the file describes processes, which do not outlive the machine either.
+    return std::rename(fresh.c_str(), file.c_str()) == 0;
+}
+
+bool isServing(const ServiceState& state) {
+    if (state.state != RunState::running || !isAlive(state.daemon)) {
+        return false;
+    }
+    return std::all_of(state.ports.begin(), state.ports.end(),
+                       [&state](int port) { return listensOn(state.daemon.pid, port); });
+}
+
+bool endLeftovers(const ServiceState& state) {
+    std::vector<ProcessId> known = state.sessions;
+    known.push_back(state.daemon);
+    const auto remaining = [&known] {
+        // What was once seen below the daemon stays known when the daemon ends first.
+        std::vector<ProcessId> living = livingTrees(known);
+        known = living;
+        return living;
+    };
+    return endProcesses(remaining, std::chrono::seconds(1));
+}
+
+} // namespace velt

@@ -1,0 +1,130 @@
+#include "tests/cli/cli_test.h"
+
+namespace {
+
+constexpr const char* usersList = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/list";
+constexpr const char* usersAdd = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/add";
+constexpr const char* usersDelete = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/delete";
+
+HttpReply json(const std::string& body) {
+    return {200, body, "application/json", false, false};
+}
+
+class ChrootTest : public CliTest {
+protected:
+    void SetUp() override {
+        host.rules = jsonOf(R"([{"type": "user", "name": "anna", "path": "/docs"},
+                                {"type": "group", "name": "staff", "path": "/gone"}])");
+    }
+};
+
+} // namespace
+
+TEST_F(ChrootTest, ConfinedUsersAreListed) {
+    host.answerWith(usersList,
+                    json(R"({"total": 7, "user": [{"id": "anna", "name": "anna", "descr": "Anna A."},
+                                                             {"id": "b", "name": "b", "descr": ""}]})"));
+    const RunResult result = run({"chroot", "users", "list"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    EXPECT_EQ(result.out, "USER  DESCRIPTION\nanna  Anna A.\nb\n2 of 7 users\n");
+    EXPECT_EQ(sent(usersList).at(0),
+              jsonOf(R"({"chroot": true, "offset": 0, "limit": -1, "type": "local"})"));
+    EXPECT_EQ(jsonOf(run({"chroot", "users", "list", "--json"}).out)["total"], 7);
+}
+
+TEST_F(ChrootTest, TheListTakesAPageASourceAndFilters) {
+    host.answerWith(usersList, json(R"({"total": 0, "user": []})"));
+    EXPECT_EQ(run({"chroot", "users", "list", "--others", "--offset", "5", "--limit", "10", "--type", "all",
+                   "--domain", "EXAMPLE", "--filter", "an"})
+                  .code,
+              0);
+    EXPECT_EQ(sent(usersList).at(0), jsonOf(R"({"chroot": false, "offset": 5, "limit": 10, "type": "all",
+                                                "domain_name": "EXAMPLE", "substr": "an"})"));
+    EXPECT_EQ(run({"chroot", "users", "list", "--type", "nis"}).code, 2);
+}
+
+TEST_F(ChrootTest, UsersAreConfinedAndReleased) {
+    host.answerWith(usersAdd, json(R"({"chrootuser_id": ["anna", "status"]})"));
+    host.answerWith(usersDelete, HttpReply{204, "", "", false, false});
+    // A user may be called like a command.
+    EXPECT_EQ(run({"chroot", "users", "add", "anna", "status"}).out, "anna: confined\nstatus: confined\n");
+    EXPECT_EQ(sent(usersAdd).at(0), jsonOf(R"({"id": ["anna", "status"]})"));
+    EXPECT_EQ(run({"chroot", "users", "delete", "anna"}).out, "anna: no longer confined\n");
+    EXPECT_EQ(sent(usersDelete).at(0), jsonOf(R"({"id": ["anna"]})"));
+    EXPECT_EQ(jsonOf(run({"--json", "chroot", "users", "add", "anna"}).out)["chrootuser_id"][0], "anna");
+    EXPECT_EQ(jsonOf(run({"--json", "chroot", "users", "delete", "anna"}).out)["id"][0], "anna");
+    EXPECT_EQ(run({"chroot", "users", "add"}).code, 2);
+}
+
+TEST_F(ChrootTest, RulesAreShown) {
+    EXPECT_EQ(run({"chroot", "rules", "load"}).out, "TYPE   NAME   DIRECTORY  EXISTS\n"
+                                                    "user   anna   /docs      yes\n"
+                                                    "group  staff  /gone      no\n");
+    EXPECT_EQ(jsonOf(run({"chroot", "rules", "load", "--json"}).out)["total"], 2);
+}
+
+TEST_F(ChrootTest, ARuleIsAddedToTheOthers) {
+    const RunResult result = run({"chroot", "rules", "add", "user", "ben", "/home"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    EXPECT_EQ(result.out, "TYPE   NAME   DIRECTORY\n"
+                          "user   anna   /docs\n"
+                          "group  staff  /gone\n"
+                          "user   ben    /home\n");
+    EXPECT_EQ(sent(rulesSave).at(0)["rules"], jsonOf(R"([{"type": "user", "name": "anna", "path": "/docs"},
+                                                         {"type": "group", "name": "staff", "path": "/gone"},
+                                                         {"type": "user", "name": "ben", "path": "/home"}])"));
+}
+
+TEST_F(ChrootTest, ARuleThatIsThereIsNotStoredAgain) {
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", "/docs"}).code, 0);
+    EXPECT_TRUE(sent(rulesSave).empty());
+}
+
+TEST_F(ChrootTest, ARuleOfAnUnknownUserIsTold) {
+    const RunResult result = run({"chroot", "rules", "add", "user", "nobody-knows", "/docs"});
+    EXPECT_EQ(result.code, 3);
+    EXPECT_NE(result.err.find("left out: user nobody-knows /docs"), std::string::npos) << result.err;
+    EXPECT_EQ(host.rules.size(), 2U);
+}
+
+TEST_F(ChrootTest, ARuleThatTheServerWouldMisreadIsNotSent) {
+    EXPECT_EQ(run({"chroot", "rules", "add", "User", "anna", "/docs"}).code, 2);
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", ""}).code, 2);
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", "docs"}).code, 2);
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "", "/docs"}).code, 2);
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna"}).code, 2);
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(ChrootTest, RulesAreRemovedByNameOrByDirectory) {
+    EXPECT_EQ(run({"chroot", "rules", "remove", "user", "anna", "/other"}).code, 3);
+    EXPECT_EQ(run({"chroot", "rules", "remove", "group", "anna"}).code, 3);
+    EXPECT_TRUE(sent(rulesSave).empty());
+    EXPECT_EQ(run({"chroot", "rules", "remove", "group", "staff", "/gone"}).code, 0);
+    EXPECT_EQ(jsonOf(run({"chroot", "rules", "remove", "user", "anna", "--json"}).out)["rules"].size(), 0U);
+    EXPECT_EQ(host.rules.size(), 0U);
+}
+
+TEST_F(ChrootTest, AllRulesAreReplacedFromAFileOrTheInput) {
+    const std::string rules = R"([{"type": "user", "name": "ben", "path": "/home", "path_exist": false}])";
+    EXPECT_EQ(run({"chroot", "rules", "save", folder.write("rules.json", rules)}).code, 0);
+    EXPECT_EQ(host.rules, jsonOf(R"([{"type": "user", "name": "ben", "path": "/home"}])"));
+    EXPECT_EQ(run({"chroot", "rules", "save", "-"}, R"({"rules": []})").code, 0);
+    EXPECT_EQ(host.rules.size(), 0U);
+}
+
+TEST_F(ChrootTest, AnInvalidSetOfRulesIsNotSent) {
+    const RunResult result =
+        run({"chroot", "rules", "save", "-"}, R"([{"type": "users", "name": "a", "path": "/x"}, 5,
+                                                  {"type": "user", "name": "a", "path": ""}])");
+    EXPECT_EQ(result.code, 3);
+    EXPECT_NE(result.err.find("rule 1: type: expected user or group"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("rule 2: an object"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("rule 3: path: expected"), std::string::npos) << result.err;
+    // Without an array the server would remove every rule.
+    EXPECT_EQ(run({"chroot", "rules", "save", "-"}, "{}").code, 3);
+    EXPECT_EQ(run({"chroot", "rules", "save", "-"}, R"({"rules": null})").code, 3);
+    EXPECT_EQ(run({"chroot", "rules", "save", "-"}, "").code, 3);
+    EXPECT_EQ(run({"chroot", "rules", "save", folder.path("absent")}).code, 2);
+    EXPECT_TRUE(asked().empty());
+}

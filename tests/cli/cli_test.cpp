@@ -1,0 +1,115 @@
+#include "tests/cli/cli_test.h"
+
+#include "cli/console.h"
+
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+TemporaryFolder::TemporaryFolder() {
+    std::string name = (std::filesystem::temp_directory_path() / "velt-cli-XXXXXX").string();
+    if (mkdtemp(name.data()) == nullptr) {
+        throw std::runtime_error("no temporary folder");
+    }
+    path_ = name;
+}
+
+TemporaryFolder::~TemporaryFolder() {
+    std::error_code ignored;
+    std::filesystem::remove_all(path_, ignored);
+}
+
+std::string TemporaryFolder::write(const std::string& name, const std::string& text) const {
+    std::ofstream(path(name)) << text;
+    return path(name);
+}
+
+std::string contentOf(const std::string& path) {
+    std::ifstream file(path);
+    std::ostringstream text;
+    text << file.rdbuf();
+    return text.str();
+}
+
+RunResult CliTest::run(const Words& words, const std::string& input) {
+    std::istringstream in(input);
+    std::ostringstream out;
+    std::ostringstream err;
+    velt::cli::Console console{in,
+                               out,
+                               err,
+                               [this](const std::string& name) {
+                                   const auto found = environment.find(name);
+                                   return found == environment.end()
+                                              ? std::nullopt
+                                              : std::optional<std::string>(found->second);
+                               },
+                               [] {},
+                               [this] {
+                                   ++interruptionsAsked;
+                                   return interrupted;
+                               }};
+    const int code = static_cast<int>(velt::cli::runProgram(words, console));
+    return {code, out.str(), err.str()};
+}
+
+std::vector<Json::Value> CliTest::sent(const std::string& request) const {
+    std::vector<Json::Value> bodies;
+    for (const HttpRequest& one : server.requests()) {
+        if (one.method + " " + one.target == request) {
+            bodies.push_back(jsonOf(one.body));
+        }
+    }
+    return bodies;
+}
+
+std::vector<std::string> CliTest::asked() const {
+    std::vector<std::string> lines;
+    for (const HttpRequest& one : server.requests()) {
+        lines.push_back(one.method + " " + one.target);
+    }
+    return lines;
+}
+
+namespace {
+
+std::vector<char*> pointersOf(std::vector<std::string>& texts) {
+    std::vector<char*> pointers;
+    pointers.reserve(texts.size() + 1);
+    for (std::string& text : texts) {
+        pointers.push_back(text.data());
+    }
+    pointers.push_back(nullptr);
+    return pointers;
+}
+
+} // namespace
+
+RunResult runProcess(const std::vector<std::string>& arguments, const std::vector<std::string>& environment) {
+    const TemporaryFolder folder;
+    const std::string out = folder.write("out", "");
+    const std::string err = folder.write("err", "");
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, out.c_str(), O_WRONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, err.c_str(), O_WRONLY, 0);
+    std::vector<std::string> words = arguments;
+    std::vector<std::string> variables = environment;
+    pid_t child = -1;
+    const int error = posix_spawn(&child, words.front().c_str(), &actions, nullptr, pointersOf(words).data(),
+                                  pointersOf(variables).data());
+    posix_spawn_file_actions_destroy(&actions);
+    int status = 0;
+    if (error != 0 || waitpid(child, &status, 0) != child) {
+        throw std::runtime_error("the program could not be run: " + words.front());
+    }
+    return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), contentOf(out), contentOf(err)};
+}

@@ -1,0 +1,134 @@
+#include "tests/cli/cli_test.h"
+
+#include <chrono>
+#include <csignal>
+#include <thread>
+
+#include <fcntl.h>
+#include <poll.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+namespace {
+
+constexpr const char* stream =
+    ": hello\n\n"
+    "event: service\ndata: {\"service\": \"ftpd\", \"action\": \"start\"}\n\n"
+    "event: log\ndata: {\"event\": \"0x11B00002\", \"text\": \"FTP on\", \"actor\": \"root\"}\n\n"
+    "event: request\ndata: {\"api\": \"A\", \"version\": 3, \"method\": \"set\", \"actor\": "
+    "\"root\", \"request_id\": \"r1\"}\n\n"
+    "event: other\ndata: plain \x1b[31m\n\n";
+
+class EventsTest : public CliTest {
+protected:
+    void answer(bool holdOpen) {
+        host.answerWith("GET /events", HttpReply{200, stream, "text/event-stream", holdOpen, false});
+    }
+};
+
+// A run of the built program that can be interrupted; its output comes through a pipe.
+class RunningProgram {
+public:
+    explicit RunningProgram(const std::string& socket) {
+        int ends[2] = {-1, -1};
+        if (pipe2(ends, O_CLOEXEC) != 0) {
+            throw std::runtime_error("no pipe");
+        }
+        posix_spawn_file_actions_t actions;
+        posix_spawn_file_actions_init(&actions);
+        posix_spawn_file_actions_adddup2(&actions, ends[1], STDOUT_FILENO);
+        std::string program = VELTCTL;
+        std::string command = "events";
+        std::string variable = "VELT_SOCKET=" + socket;
+        char* const arguments[] = {program.data(), command.data(), nullptr};
+        char* const variables[] = {variable.data(), nullptr};
+        const int error = posix_spawn(&child_, program.c_str(), &actions, nullptr, arguments, variables);
+        posix_spawn_file_actions_destroy(&actions);
+        close(ends[1]);
+        output_ = ends[0];
+        if (error != 0) {
+            throw std::runtime_error("the program could not be started");
+        }
+    }
+    ~RunningProgram() { close(output_); }
+    RunningProgram(const RunningProgram&) = delete;
+    RunningProgram& operator=(const RunningProgram&) = delete;
+
+    // Everything up to the text, or what came in ten seconds.
+    std::string readUntil(const std::string& text) const {
+        std::string seen;
+        pollfd waiting{output_, POLLIN, 0};
+        while (seen.find(text) == std::string::npos && poll(&waiting, 1, 10000) == 1) {
+            char buffer[1024];
+            const ssize_t got = read(output_, buffer, sizeof buffer);
+            if (got <= 0) {
+                break;
+            }
+            seen.append(buffer, static_cast<std::size_t>(got));
+        }
+        return seen;
+    }
+
+    int interrupt() const {
+        kill(child_, SIGINT);
+        int status = 0;
+        waitpid(child_, &status, 0);
+        return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+    }
+
+private:
+    pid_t child_ = -1;
+    int output_ = -1;
+};
+
+} // namespace
+
+TEST_F(EventsTest, EachKindIsDescribedOnOneLine) {
+    answer(true);
+    const RunResult result = run({"events", "--count", "4"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    for (const char* line : {"Z  service  ftpd: start\n", "Z  log  0x11B00002 FTP on (root)\n",
+                             "Z  request  A v3 set by root (r1)\n", "Z  other  plain \\x1b[31m\n"}) {
+        EXPECT_NE(result.out.find(line), std::string::npos) << line << "\n" << result.out;
+    }
+}
+
+TEST_F(EventsTest, ProgramsGetOneObjectPerLine) {
+    answer(true);
+    const RunResult result = run({"events", "--count", "1", "--json"});
+    EXPECT_EQ(result.code, 0);
+    EXPECT_EQ(result.out.find('\n'), result.out.size() - 1);
+    EXPECT_EQ(jsonOf(result.out),
+              jsonOf(R"({"event": "service", "data": {"service": "ftpd", "action": "start"}})"));
+}
+
+TEST_F(EventsTest, AnInterruptionEndsTheCommandWell) {
+    answer(true);
+    interrupted = true;
+    EXPECT_EQ(run({"events"}).code, 0);
+    EXPECT_GT(interruptionsAsked, 0);
+}
+
+TEST_F(EventsTest, TheInterruptedProgramLeavesWithZero) {
+    answer(true);
+    const RunningProgram program(server.socketPath());
+    EXPECT_NE(program.readUntil("ftpd: start").find("ftpd: start"), std::string::npos);
+    EXPECT_EQ(program.interrupt(), 0);
+}
+
+TEST_F(EventsTest, AStreamThatTheServerEndsIsNoSuccess) {
+    answer(false);
+    const RunResult result = run({"events"});
+    EXPECT_EQ(result.code, 6);
+    EXPECT_NE(result.out.find("ftpd: start"), std::string::npos);
+    EXPECT_NE(result.err.find("ended the stream"), std::string::npos);
+}
+
+TEST_F(EventsTest, ARefusalIsNoStream) {
+    host.answerWith("GET /events", problemReply(401, R"({"title": "Who asks?"})"));
+    const RunResult result = run({"events"});
+    EXPECT_EQ(result.code, 6);
+    EXPECT_EQ(result.out, "");
+    EXPECT_NE(result.err.find("Who asks?"), std::string::npos);
+}

@@ -1,0 +1,99 @@
+// The documented exit codes, of the built program.
+#include "tests/cli/cli_test.h"
+
+class ExitCodesTest : public CliTest {
+protected:
+    int codeOf(const Words& words) {
+        std::vector<std::string> arguments{VELTCTL};
+        arguments.insert(arguments.end(), words.begin(), words.end());
+        last = runProcess(arguments, {"VELT_SOCKET=" + server.socketPath()});
+        return last.code;
+    }
+
+    int codeAfter(int status) {
+        host.answerWith(ftpSet, problemReply(status, R"({"title": "A title", "request_id": "r-1"})"));
+        return codeOf({"ftp", "set", "portnum=2121"});
+    }
+
+    RunResult last;
+};
+
+TEST_F(ExitCodesTest, Done) {
+    EXPECT_EQ(codeOf({"sftp", "get"}), 0);
+    EXPECT_EQ(last.out.substr(0, 7), "SETTING");
+    EXPECT_EQ(codeOf({"sftp", "set", "portnum=2222"}), 0);
+    EXPECT_EQ(codeOf({"--help"}), 0);
+    EXPECT_NE(last.out.find("Exit codes: 0 done"), std::string::npos);
+    EXPECT_EQ(codeOf({"ftp", "set", "--help"}), 0);
+    EXPECT_NE(last.out.find("maxuploadrate"), std::string::npos);
+    EXPECT_EQ(codeOf({"--version"}), 0);
+    EXPECT_EQ(last.err, "");
+}
+
+TEST_F(ExitCodesTest, LocalFile) {
+    EXPECT_EQ(codeOf({"export", "-o", folder.path("absent/file")}), 1);
+    EXPECT_NE(last.err.find("cannot be written"), std::string::npos);
+}
+
+TEST_F(ExitCodesTest, Usage) {
+    for (const Words& words :
+         {Words{}, Words{"other"}, Words{"ftp"}, Words{"ftp", "other"}, Words{"--other"},
+          Words{"ftp", "set", "other=1"}, Words{"status", "extra"}, Words{"chroot", "rules"}}) {
+        EXPECT_EQ(codeOf(words), 2) << testing::PrintToString(words);
+        EXPECT_EQ(last.out, "");
+        EXPECT_EQ(last.err.substr(0, 9), "veltctl: ");
+        EXPECT_NE(last.err.find("What to do: "), std::string::npos) << last.err;
+    }
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(ExitCodesTest, RefusedInput) {
+    EXPECT_EQ(codeAfter(422), 3);
+    EXPECT_EQ(codeAfter(400), 3);
+    EXPECT_EQ(codeAfter(404), 3);
+    EXPECT_EQ(codeAfter(405), 3);
+    EXPECT_EQ(codeAfter(413), 3);
+}
+
+TEST_F(ExitCodesTest, Conflict) {
+    EXPECT_EQ(codeAfter(409), 4);
+    EXPECT_NE(last.err.find("Choose another port"), std::string::npos);
+}
+
+TEST_F(ExitCodesTest, ThePlatformFailed) {
+    EXPECT_EQ(codeAfter(500), 5);
+    EXPECT_NE(last.err.find("request id r-1"), std::string::npos);
+    EXPECT_NE(last.err.find("may be in effect"), std::string::npos);
+    EXPECT_EQ(codeAfter(503), 5);
+}
+
+TEST_F(ExitCodesTest, NoConnectionOrAccess) {
+    EXPECT_EQ(codeAfter(401), 6);
+    EXPECT_EQ(codeAfter(403), 6);
+    EXPECT_EQ(codeAfter(408), 6);
+    EXPECT_EQ(codeAfter(429), 6);
+    EXPECT_EQ(codeAfter(302), 6);
+    EXPECT_EQ(codeOf({"status", "--socket", folder.path("absent")}), 6);
+}
+
+TEST_F(ExitCodesTest, AFullOutputIsNoSuccess) {
+    const RunResult result = runProcess({"/bin/sh", "-c", "exec \"$0\" sftp get >/dev/full", VELTCTL},
+                                        {"VELT_SOCKET=" + server.socketPath()});
+    EXPECT_EQ(result.code, 1);
+    EXPECT_NE(result.err.find("cannot be written"), std::string::npos) << result.err;
+}
+
+TEST_F(ExitCodesTest, AShareThatCannotBeReachedIsAConflictOfItsOwn) {
+    host.answerWith(securitySet, problemReply(409, R"({"title": "Not reachable", "code": 1905})"));
+    EXPECT_EQ(codeOf({"security", "set", "anonymous_chroot=on"}), 4);
+    EXPECT_NE(last.err.find("veltctl shares"), std::string::npos) << last.err;
+}
+
+TEST_F(ExitCodesTest, AProblemOfAnyFormIsTold) {
+    for (const char* body : {"", "<html>", "[]", R"({"errors": 5, "title": {"a": 1}, "code": null})",
+                             R"({"errors": [5, {"field": 7}]})"}) {
+        host.answerWith(ftpSet, problemReply(422, body));
+        EXPECT_EQ(codeOf({"ftp", "set", "portnum=1"}), 3) << body;
+        EXPECT_NE(last.err.find("HTTP 422"), std::string::npos) << body;
+    }
+}

@@ -1,0 +1,46 @@
+// The server's side of the API, with settings that can be read and changed, and scripted answers where a test wants them.
+#ifndef VELT_TESTS_CLI_FAKE_HOST_H
+#define VELT_TESTS_CLI_FAKE_HOST_H
+
+#include "tests/cli/http_server.h"
+
+#include <json/value.h>
+
+#include <map>
+#include <set>
+#include <string>
+
+class FakeHost {
+public:
+    FakeHost();
+
+    /// Answers as the server would: what answerWith() says comes first.
+    HttpReply handle(const HttpRequest& request);
+
+    /// From now on the request "METHOD /target" gets this answer.
+    void answerWith(const std::string& request, HttpReply reply) { scripted_[request] = std::move(reply); }
+
+    // What the server holds. Not for use while a request runs.
+    Json::Value ftp;
+    Json::Value security;
+    Json::Value sftp;
+    Json::Value rules{Json::arrayValue};
+    Json::Value chrootUsers{Json::arrayValue};
+    std::set<std::string> accounts{"anna", "ben", "staff"};
+
+private:
+    HttpReply set(Json::Value& settings, const Json::Value& parameters,
+                  const std::set<std::string>& required);
+    HttpReply saveRules(const Json::Value& parameters);
+    HttpReply callMethod(const std::string& row, const Json::Value& parameters);
+
+    std::map<std::string, HttpReply> scripted_;
+};
+
+/// An application/problem+json answer with the members of the JSON text `problem`.
+HttpReply problemReply(int status, const std::string& problem);
+
+Json::Value jsonOf(const std::string& text);
+std::string textOf(const Json::Value& value);
+
+#endif

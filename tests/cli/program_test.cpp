@@ -1,0 +1,79 @@
+#include "tests/cli/cli_test.h"
+
+#include <algorithm>
+
+using ProgramTest = CliTest;
+
+TEST_F(ProgramTest, EveryCommandExplainsItself) {
+    for (const velt::cli::CommandDescription& command : velt::cli::describeCommands()) {
+        Words words;
+        std::string word;
+        for (const char c : command.words + " ") {
+            if (c == ' ') {
+                if (!word.empty()) {
+                    words.push_back(word);
+                }
+                word.clear();
+            } else {
+                word += c;
+            }
+        }
+        words.emplace_back("--help");
+        const RunResult result = run(words);
+        EXPECT_EQ(result.code, 0) << command.words;
+        EXPECT_NE(result.out.find("Usage: "), std::string::npos) << command.words;
+        EXPECT_EQ(result.err, "") << command.words;
+    }
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
+    std::vector<std::string> words;
+    for (const velt::cli::CommandDescription& command : velt::cli::describeCommands()) {
+        words.push_back(command.words);
+    }
+    std::sort(words.begin(), words.end());
+    EXPECT_EQ(words, (Words{"",
+                            "call",
+                            "chroot",
+                            "chroot rules",
+                            "chroot rules add",
+                            "chroot rules load",
+                            "chroot rules remove",
+                            "chroot rules save",
+                            "chroot users",
+                            "chroot users add",
+                            "chroot users delete",
+                            "chroot users list",
+                            "events",
+                            "export",
+                            "ftp",
+                            "ftp get",
+                            "ftp set",
+                            "import",
+                            "log",
+                            "security",
+                            "security get",
+                            "security set",
+                            "sftp",
+                            "sftp get",
+                            "sftp set",
+                            "shares",
+                            "status",
+                            "tokens",
+                            "tokens create",
+                            "tokens delete",
+                            "tokens list"}));
+}
+
+TEST_F(ProgramTest, BothTransportsCarryTheSameRequests) {
+    EXPECT_EQ(run({"sftp", "set", "enable=on"}).code, 0);
+    environment = {{"VELT_URL", server.url()}};
+    EXPECT_EQ(run({"sftp", "set", "enable=off"}).code, 0);
+    ASSERT_EQ(sent(sftpSet).size(), 2U);
+    for (const HttpRequest& request : server.requests()) {
+        const bool hasType = request.head.find("Content-Type: application/json\r\n") != std::string::npos;
+        EXPECT_EQ(hasType, request.method == "POST") << request.head;
+        EXPECT_EQ(request.head.find("Expect:"), std::string::npos);
+    }
+}

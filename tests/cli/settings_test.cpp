@@ -1,0 +1,165 @@
+#include "tests/cli/cli_test.h"
+
+using SettingsTest = CliTest;
+
+TEST_F(SettingsTest, GetShowsATableInAFixedOrder) {
+    const RunResult result = run({"sftp", "get"});
+    EXPECT_EQ(result.code, 0);
+    EXPECT_EQ(result.out, "SETTING  VALUE  MEANING\n"
+                          "enable   off    SFTP runs\n"
+                          "portnum  22     port\n");
+    EXPECT_EQ(result.err, "");
+}
+
+TEST_F(SettingsTest, GetShowsEachFtpSetting) {
+    const RunResult result = run({"ftp", "get"});
+    ASSERT_EQ(result.code, 0);
+    EXPECT_EQ(asked(), std::vector<std::string>{ftpGet});
+    for (const std::string& key : host.ftp.getMemberNames()) {
+        EXPECT_NE(result.out.find("\n" + key + " "), std::string::npos) << key;
+    }
+}
+
+TEST_F(SettingsTest, GetWritesTheServersObjectAsJson) {
+    EXPECT_EQ(jsonOf(run({"ftp", "get", "--json"}).out), host.ftp);
+    EXPECT_EQ(jsonOf(run({"--json", "security", "get"}).out), host.security);
+    EXPECT_EQ(jsonOf(run({"sftp", "--json", "get"}).out), host.sftp);
+}
+
+TEST_F(SettingsTest, OneFtpSettingIsChangedAloneBesideTheRequiredKeys) {
+    const RunResult result = run({"ftp", "set", "timeout=-5"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    EXPECT_EQ(result.out, "timeout: 300 -> -5\n");
+    ASSERT_EQ(sent(ftpSet).size(), 1U);
+    EXPECT_EQ(sent(ftpSet)[0], jsonOf(R"({"enable_ftp": true, "enable_ftps": false, "timeout": -5})"));
+    EXPECT_EQ(asked(), (std::vector<std::string>{ftpGet, ftpSet, ftpGet}));
+}
+
+TEST_F(SettingsTest, OneSftpSettingIsChangedAlone) {
+    EXPECT_EQ(run({"sftp", "set", "portnum=2222"}).out, "portnum: 22 -> 2222\n");
+    EXPECT_EQ(sent(sftpSet).at(0), jsonOf(R"({"enable": false, "portnum": 2222})"));
+}
+
+TEST_F(SettingsTest, SecurityNeedsNoOtherKey) {
+    EXPECT_EQ(run({"security", "set", "anonymous_chroot_share=docs"}).out,
+              "anonymous_chroot_share: (empty) -> docs\n");
+    EXPECT_EQ(sent(securitySet).at(0), jsonOf(R"({"anonymous_chroot_share": "docs"})"));
+}
+
+TEST_F(SettingsTest, AllWordsForASwitchAreKnown) {
+    for (const char* word : {"true", "on", "yes", "ON", "Yes"}) {
+        host.ftp["enable_fxp"] = false;
+        EXPECT_EQ(run({"ftp", "set", std::string("enable_fxp=") + word}).out, "enable_fxp: off -> on\n")
+            << word;
+    }
+    for (const char* word : {"false", "off", "no"}) {
+        host.ftp["enable_fxp"] = true;
+        EXPECT_EQ(run({"ftp", "set", std::string("enable_fxp=") + word}).out, "enable_fxp: on -> off\n")
+            << word;
+    }
+}
+
+TEST_F(SettingsTest, SeveralSettingsAndARequiredOneGoInOneRequest) {
+    EXPECT_EQ(run({"ftp", "set", "enable_ftp=no", "portnum=2121"}).out,
+              "enable_ftp: on -> off\nportnum: 21 -> 2121\n");
+    EXPECT_EQ(sent(ftpSet).at(0), jsonOf(R"({"enable_ftp": false, "enable_ftps": false, "portnum": 2121})"));
+}
+
+TEST_F(SettingsTest, ATextMayHoldEqualsSignsAndBeEmpty) {
+    EXPECT_EQ(run({"security", "set", "anonymous_chroot_share=a=b"}).code, 0);
+    EXPECT_EQ(host.security["anonymous_chroot_share"], "a=b");
+    EXPECT_EQ(run({"security", "set", "anonymous_chroot_share="}).code, 0);
+    EXPECT_EQ(host.security["anonymous_chroot_share"], "");
+}
+
+TEST_F(SettingsTest, ARangeAloneSwitchesTheRangeOn) {
+    EXPECT_EQ(run({"ftp", "set", "custom_port=6000:6010"}).out,
+              "custom_port_range: off -> on\ncustom_port: 55536:55567 -> 6000:6010\n");
+}
+
+TEST_F(SettingsTest, TheRangesSwitchAloneTakesTheRangeAlong) {
+    EXPECT_EQ(run({"ftp", "set", "custom_port_range=on"}).out, "custom_port_range: off -> on\n");
+    EXPECT_EQ(sent(ftpSet).at(0)["custom_port"], "55536:55567");
+    EXPECT_EQ(run({"ftp", "set", "custom_port_range=off"}).code, 0);
+    EXPECT_FALSE(sent(ftpSet).at(1).isMember("custom_port"));
+}
+
+TEST_F(SettingsTest, NothingDifferentIsSaid) {
+    EXPECT_EQ(run({"ftp", "set", "portnum=21"}).out, "Nothing changed.\n");
+    EXPECT_EQ(sent(ftpSet).size(), 1U); // the server decides
+}
+
+TEST_F(SettingsTest, SetWritesTheChangesAsJson) {
+    const Json::Value result = jsonOf(run({"ftp", "set", "portnum=2121", "--json"}).out);
+    EXPECT_EQ(result["changed"], jsonOf(R"([{"key": "portnum", "from": 21, "to": 2121}])"));
+    EXPECT_EQ(result["settings"], host.ftp);
+}
+
+TEST_F(SettingsTest, AValueThatTheServerPassesOverIsTold) {
+    host.answerWith(ftpSet, HttpReply{204, "", "", false, false});
+    const RunResult result = run({"ftp", "set", "utf8_mode=2"});
+    EXPECT_EQ(result.code, 0);
+    EXPECT_EQ(result.out, "Nothing changed.\n");
+    EXPECT_EQ(result.err, "veltctl: warning: the server accepted utf8_mode=2, but shows 1.\n");
+}
+
+TEST_F(SettingsTest, EachVersionOfFtpHasItsOwnKeyForUtf8) {
+    EXPECT_EQ(run({"ftp", "set", "--api-version", "1", "enable_utf8=on"}).code, 0);
+    EXPECT_EQ(sent("POST /api/VELT.Core.FileServ.FTP/v1/set").at(0)["enable_utf8"], true);
+    EXPECT_EQ(run({"ftp", "set", "--api-version", "2", "use_utf8=on"}).code, 0);
+    EXPECT_EQ(sent("POST /api/VELT.Core.FileServ.FTP/v2/set").at(0)["use_utf8"], true);
+    EXPECT_EQ(run({"ftp", "set", "use_utf8=on"}).code, 2);
+    EXPECT_EQ(run({"ftp", "get", "--api-version", "4"}).code, 2);
+    EXPECT_EQ(run({"ftp", "get", "--api-version", "2"}).code, 0);
+    EXPECT_EQ(asked().back(), "GET /api/VELT.Core.FileServ.FTP/v2/get");
+}
+
+TEST_F(SettingsTest, AnUnknownKeyNamesTheKnownOnesAndAsksNothing) {
+    const RunResult result = run({"sftp", "set", "port=22"});
+    EXPECT_EQ(result.code, 2);
+    EXPECT_EQ(result.err,
+              "veltctl: \"port\" is no setting of sftp.\nWhat to do: Known keys: enable, portnum.\n");
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(SettingsTest, AValueOfTheWrongTypeAsksNothing) {
+    for (const char* word : {"portnum=", "portnum=abc", "portnum=21x", "portnum=99999999999", "portnum=1.5",
+                             "enable_ftp=1", "enable_ftp=", "enable_ftp", "portnum"}) {
+        const RunResult result = run({"ftp", "set", word});
+        EXPECT_EQ(result.code, 2) << word;
+        EXPECT_EQ(result.out, "") << word;
+    }
+    EXPECT_EQ(run({"ftp", "set", "portnum=1", "portnum=2"}).code, 2);
+    EXPECT_EQ(run({"ftp", "set"}).code, 2);
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(SettingsTest, AnAnswerWithoutTheRequiredKeysIsNotBuiltUpon) {
+    host.ftp.removeMember("enable_ftps");
+    EXPECT_EQ(run({"ftp", "set", "portnum=2121"}).code, 5);
+    EXPECT_TRUE(sent(ftpSet).empty());
+}
+
+TEST_F(SettingsTest, ARefusedChangeNamesTheField) {
+    host.answerWith(ftpSet,
+                    problemReply(422, R"({"title": "A parameter is not valid", "status": 422, "code": 1901,
+        "detail": "Wrong UTF-8 webapi parameter", "request_id": "r-7",
+        "errors": [{"field": "utf8_mode", "expected": "0, 1 or 2"}]})"));
+    const RunResult result = run({"ftp", "set", "utf8_mode=9"});
+    EXPECT_EQ(result.code, 3);
+    EXPECT_EQ(result.out, "");
+    EXPECT_EQ(result.err, "veltctl: The server refused the input (HTTP 422, code 1901).\n"
+                          "  A parameter is not valid\n"
+                          "  Wrong UTF-8 webapi parameter\n"
+                          "  utf8_mode: expected 0, 1 or 2\n"
+                          "  request id r-7\n"
+                          "What to do: Correct the input and try again. Nothing was changed.\n");
+}
+
+TEST_F(SettingsTest, SharesAreListed) {
+    host.answerWith(
+        "GET /api/VELT.Core.FileServ.FTP.Security/v1/list_ftp_share",
+        HttpReply{200, R"({"share": ["docs", "m\u00fcll\u001b[31m"]})", "application/json", false, false});
+    EXPECT_EQ(run({"shares"}).out, "SHARE\ndocs\nm\u00fcll\\x1b[31m\n");
+    EXPECT_EQ(jsonOf(run({"shares", "--json"}).out)["share"][0], "docs");
+}

@@ -1,0 +1,72 @@
+#include "cli/http_client.h"
+#include "cli/json_text.h"
+#include "cli/table.h"
+#include "cli/time_text.h"
+
+#include <gtest/gtest.h>
+
+#include <sstream>
+
+using namespace velt::cli;
+
+TEST(TextTest, ControlCharactersCannotReachATerminal) {
+    EXPECT_EQ(printable("plain \xC3\xBC"), "plain \xC3\xBC");
+    EXPECT_EQ(printable(std::string("a\x1b]0;x\x07\0b\x7f", 10)), "a\\x1b]0;x\\x07\\x00b\\x7f");
+    EXPECT_EQ(printable("\xC2\x9B"
+                        "31m"),
+              "\\x9b31m");
+    EXPECT_EQ(printable("\xC2\xA0"), "\xC2\xA0");
+}
+
+TEST(TextTest, ColumnsAreAlignedByCharacters) {
+    Table table({"A", "B"});
+    table.add({"\xC3\xBC\xC3\xBC\xC3\xBC", "1"});
+    table.add({"x", ""});
+    std::ostringstream out;
+    table.write(out);
+    EXPECT_EQ(out.str(), "A    B\n\xC3\xBC\xC3\xBC\xC3\xBC  1\nx\n");
+}
+
+TEST(TextTest, PathsAreEncoded) {
+    EXPECT_EQ(percentEncode("A.b-c_d~9"), "A.b-c_d~9");
+    EXPECT_EQ(percentEncode("/ ?&=%+\xC3\xBC"), "%2F%20%3F%26%3D%25%2B%C3%BC");
+}
+
+TEST(TextTest, AgesAreTakenFromNow) {
+    EXPECT_EQ(parseSince("30s", 100), "1970-01-01T00:01:10Z");
+    EXPECT_EQ(parseSince("1m", 100), "1970-01-01T00:00:40Z");
+    EXPECT_EQ(parseSince("2h", 7200), "1970-01-01T00:00:00Z");
+    EXPECT_EQ(parseSince("1d", 86401), "1970-01-01T00:00:01Z");
+    EXPECT_EQ(parseSince("2026-11-21", 0), "2026-11-21");
+    EXPECT_EQ(parseSince("", 0), std::nullopt);
+    EXPECT_EQ(parseSince("1.5h", 0), std::nullopt);
+    EXPECT_EQ(parseSince("99999999999d", 0), std::nullopt);
+}
+
+TEST(TextTest, DurationsHaveTwoUnits) {
+    EXPECT_EQ(durationText(8), "8 s");
+    EXPECT_EQ(durationText(63), "1 min 3 s");
+    EXPECT_EQ(durationText(3600 * 5 + 60 * 10 + 1), "5 h 10 min");
+    EXPECT_EQ(durationText(259200), "3 d 0 h");
+}
+
+TEST(TextTest, ValuesAreShownForPeople) {
+    EXPECT_EQ(displayValue(true), "on");
+    EXPECT_EQ(displayValue(-3), "-3");
+    EXPECT_EQ(displayValue("\xC3\xBC"), "\xC3\xBC");
+    EXPECT_EQ(displayValue(Json::Value()), "");
+    Json::Value array(Json::arrayValue);
+    array.append("\xC3\xBC");
+    EXPECT_EQ(displayValue(array), "[\"\xC3\xBC\"]");
+}
+
+TEST(TextTest, JsonIsReadStrictly) {
+    std::string problem;
+    EXPECT_TRUE(parseJson("5", problem));
+    for (const char* text :
+         {"", "{} x", "{'a': 1}", "{\"a\": 1, \"a\": 2}", "{\"a\": 1,}", "// c\n{}", "NaN"}) {
+        problem.clear();
+        EXPECT_FALSE(parseJson(text, problem)) << text;
+        EXPECT_NE(problem, "") << text;
+    }
+}

@@ -1,0 +1,84 @@
+#include "platform/adminlog.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/standalone.h"
+#include "tests/standalone/support/process.h"
+#include "tests/standalone/support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <map>
+#include <set>
+#include <thread>
+
+namespace velt {
+namespace {
+
+constexpr int each = 100;
+
+/// How many entries each actor has, and that no id is there twice.
+std::map<std::string, int> countByActor() {
+    std::map<std::string, int> counts;
+    std::set<std::int64_t> ids;
+    LogFilter filter;
+    for (filter.limit = 1000;;) {
+        const auto page = queryLog(filter);
+        EXPECT_TRUE(page) << lastErrorSentence();
+        if (!page || page->empty())
+            return counts;
+        for (const LogEntry& entry : *page) {
+            ++counts[entry.actor];
+            EXPECT_TRUE(ids.insert(entry.id).second);
+        }
+        filter.beforeId = page->back().id;
+    }
+}
+
+TEST(LogProcesses, SeveralProcessesThatStartAtOnceLoseNothing) {
+    const test::TemporaryFolder folder;
+    std::vector<pid_t> writers;
+    for (const char* name : {"one", "two", "three"})
+        writers.push_back(test::start({LOG_WRITER, folder.path().string(), name, std::to_string(each)}));
+    for (const pid_t writer : writers)
+        EXPECT_EQ(test::finish(writer), 0);
+    setStateRoot(folder.path());
+    EXPECT_EQ(countByActor(), (std::map<std::string, int>{{"one", each}, {"two", each}, {"three", each}}));
+}
+
+TEST(LogProcesses, ThreadsBesideAnotherProcessLoseNothing) {
+    const test::TemporaryFolder folder;
+    setStateRoot(folder.path());
+    const pid_t writer = test::start({LOG_WRITER, folder.path().string(), "process", std::to_string(each)});
+    std::vector<std::thread> threads;
+    for (const char* name : {"first", "second"})
+        threads.emplace_back([name] {
+            setRequestActor(name, "");
+            for (int i = 0; i < each; ++i)
+                EXPECT_EQ(VELTLogSet1(1, 1, 0x11B00024, "x", "", "", ""), 0) << lastErrorSentence();
+        });
+    for (std::thread& thread : threads)
+        thread.join();
+    EXPECT_EQ(test::finish(writer), 0);
+    EXPECT_EQ(countByActor(),
+              (std::map<std::string, int>{{"process", each}, {"first", each}, {"second", each}}));
+}
+
+TEST(LogProcesses, AWriterThatIsKilledLeavesAWholeLog) {
+    const test::TemporaryFolder folder;
+    setStateRoot(folder.path());
+    for (int round = 0; round < 10; ++round) {
+        const pid_t writer = test::start({LOG_WRITER, folder.path().string(), "killed", "1000000"});
+        ASSERT_GT(writer, 0);
+        std::this_thread::sleep_for(std::chrono::milliseconds(10 + 7 * round));
+        kill(writer, SIGKILL);
+        test::finish(writer);
+        ASSERT_EQ(VELTLogSet1(1, 1, 0x11B00024, "x", "", "", ""), 0) << lastErrorSentence();
+    }
+    const std::map<std::string, int> counts = countByActor();
+    EXPECT_EQ(counts.at(""), 10);
+    EXPECT_GT(counts.at("killed"), 0);
+}
+
+} // namespace
+} // namespace velt

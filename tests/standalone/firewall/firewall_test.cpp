@@ -1,0 +1,295 @@
+// The firewall in force, seen from another host.
+
+#include "ftp/ftp_library.h"
+#include "platform/firewall.h"
+#include "platform/service.h"
+#include "platform/sftp.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
+#include "standalone/core/state_root.h"
+#include "tests/standalone/firewall/private_network.h"
+#include "tests/standalone/services/plan_double.h"
+#include "tests/standalone/supervise/daemon_test.h"
+
+#include <gtest/gtest.h>
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <sched.h>
+#include <sys/socket.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <optional>
+#include <thread>
+#include <utility>
+
+namespace velt::test {
+namespace {
+
+/// Listens on all addresses of the private network.
+class OpenPort {
+public:
+    explicit OpenPort(int port) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+        sockaddr_in address{};
+        address.sin_family = AF_INET;
+        address.sin_port = htons(static_cast<in_port_t>(port));
+        EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+        EXPECT_EQ(::listen(descriptor_, 16), 0);
+    }
+    ~OpenPort() { ::close(descriptor_); }
+    OpenPort(const OpenPort&) = delete;
+    OpenPort& operator=(const OpenPort&) = delete;
+
+private:
+    int descriptor_;
+};
+
+std::string listTable() {
+    return runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).output;
+}
+
+class FirewallTest : public DaemonTest {
+protected:
+    void SetUp() override {
+        DaemonTest::SetUp();
+        network_.emplace();
+        if (!network_->isThere() || runProcess({"nft", "list", "tables"}).exitCode != 0) {
+            GTEST_SKIP() << "no private network here";
+        }
+        storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
+        setMode(""); // below this root no rule is touched without a file
+    }
+
+    void TearDown() override {
+        network_.reset(); // its other host is a process of ours
+        DaemonTest::TearDown();
+    }
+
+    static void storeFtp(int port, int flags, int passiveFirst = 0, int passiveLast = 0) {
+        _tag_VELT_FTP_CONF_ record{};
+        ASSERT_EQ(VELTFTPConfGet(&record), 0) << lastErrorSentence();
+        std::snprintf(record.portnum, sizeof record.portnum, "%d", port);
+        record.service_flags = flags;
+        record.passive_port_min = passiveFirst;
+        record.passive_port_max = passiveLast;
+        ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    }
+
+    static void setMode(const std::string& lines) {
+        ASSERT_EQ(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\n" + lines + "\n", 0644), 0);
+    }
+
+    static std::string warning() { return readFile(statePath("/run/velt/firewall.warning")).value_or(""); }
+
+    std::optional<PrivateNetwork> network_;
+};
+
+TEST_F(FirewallTest, AcceptIsTheDefaultAndClosesNothing) {
+    const OpenPort control(2121);
+    const OpenPort other(8080);
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable().find("2121"), std::string::npos) << listTable();
+    EXPECT_NE(listTable().find("55536-55899"), std::string::npos) << listTable();
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+    EXPECT_TRUE(network_->neighbourReaches(8080));
+}
+
+TEST_F(FirewallTest, DropOpensThePortsOfTheServicesAndTheFurtherOnes) {
+    const OpenPort control(2121);
+    const OpenPort passive(40001);
+    const OpenPort further(8022);
+    const OpenPort closed(8080);
+    ASSERT_TRUE(network_->neighbourReaches(8080));
+    storeFtp(2121, VELT_FTP_SERVICE_PLAIN, 40000, 40010);
+    setMode("mode = drop\nports = 8020-8030");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+    EXPECT_TRUE(network_->neighbourReaches(40001));
+    EXPECT_TRUE(network_->neighbourReaches(8022));
+    EXPECT_FALSE(network_->neighbourReaches(8080));
+}
+
+TEST_F(FirewallTest, TheRulesFollowThePorts) {
+    const OpenPort former(2121);
+    const OpenPort next(2122);
+    const OpenPort sftp(2222);
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+    EXPECT_FALSE(network_->neighbourReaches(2122));
+    storeFtp(2122, VELT_FTP_SERVICE_TLS);
+    ASSERT_EQ(VELTSFTPConfigSet(1, 2222), 0) << lastErrorSentence();
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_FALSE(network_->neighbourReaches(2121));
+    EXPECT_TRUE(network_->neighbourReaches(2122));
+    EXPECT_TRUE(network_->neighbourReaches(2222));
+    storeFtp(2122, 0);
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_FALSE(network_->neighbourReaches(2122));
+}
+
+TEST_F(FirewallTest, TheRulesFollowWhatIsEnabled) {
+    planDouble() = {};
+    planDouble().ftpOptions = planDouble().sftpOptions = {"--any"};
+    storeFtp(2121, 0);
+    ASSERT_EQ(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+    ASSERT_EQ(VELTSFTPConfigSet(1, 2222), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(2222));
+    storeFtp(2121, 0);
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    ASSERT_EQ(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+    const OpenPort formerFtp(2121);
+    const OpenPort formerSftp(2222);
+    EXPECT_FALSE(network_->neighbourReaches(2121));
+    EXPECT_FALSE(network_->neighbourReaches(2222));
+}
+
+TEST_F(FirewallTest, RulesThatCannotBeLoadedKeepNoServiceDown) {
+    planDouble() = {};
+    setMode("mode = open");
+    EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+}
+
+TEST_F(FirewallTest, SettingsInTheMiddleOfAChangeAreWaitedFor) {
+    std::optional<StateLock> change(std::in_place);
+    std::atomic<bool> done = false;
+    std::thread loader([&done] {
+        EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+        done = true;
+    });
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    EXPECT_FALSE(done);
+    storeFtp(2122, VELT_FTP_SERVICE_PLAIN);
+    change.reset();
+    loader.join();
+    EXPECT_NE(listTable().find("2122"), std::string::npos) << listTable();
+}
+
+TEST_F(FirewallTest, OverlappingPortsAreOneSet) {
+    setMode("mode = drop\nports = 2121 2100-2130 22");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const OpenPort control(2121);
+    EXPECT_TRUE(network_->neighbourReaches(2121));
+}
+
+TEST_F(FirewallTest, OffRemovesTheRules) {
+    const OpenPort other(8080);
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_FALSE(network_->neighbourReaches(8080));
+    setMode("mode = off");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_TRUE(network_->neighbourReaches(8080));
+    EXPECT_EQ(listTable(), "");
+}
+
+TEST_F(FirewallTest, ADamagedFileLeavesTheRulesInForce) {
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::string before = listTable();
+    setMode("mode = open");
+    EXPECT_LT(VELTFwRuleHup(), 0);
+    EXPECT_NE(lastErrorSentence().find("firewall.conf, line 2: "), std::string::npos) << lastErrorSentence();
+    EXPECT_EQ(listTable(), before);
+}
+
+TEST_F(FirewallTest, AnotherFirewallThatDropsIsPointedOut) {
+    ASSERT_EQ(
+        runProcess({"nft", "-f", "-"},
+                   "table ip other {\nchain input {\ntype filter hook input priority 0; policy drop;\n}\n}\n")
+            .exitCode,
+        0);
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(warning().find("\"ip other input\""), std::string::npos) << warning();
+    ASSERT_EQ(runProcess({"nft", "delete", "table", "ip", "other"}).exitCode, 0);
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(warning(), "");
+}
+
+TEST_F(FirewallTest, AnInstallationElsewhereWithoutAFileLeavesTheRulesAlone) {
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::string before = listTable();
+    setStateRoot(root_ / "second");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(listTable(), before);
+    setMode("mode = accept");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), before);
+}
+
+TEST_F(FirewallTest, OtherTablesStay) {
+    ASSERT_EQ(runProcess({"nft", "add", "table", "ip", "other"}).exitCode, 0);
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(runProcess({"nft", "list", "tables"}).output.find("table ip other"), std::string::npos);
+}
+
+TEST_F(FirewallTest, AListedEffectChangesNothing) {
+    std::string listed;
+    setEffectHook([&listed](Effect effect, std::string_view subject) {
+        listed = std::string(effectName(effect)) + " " + std::string(subject);
+        return EffectDecision{false, 0};
+    });
+    EXPECT_EQ(VELTFwRuleHup(), 0);
+    setEffectHook({});
+    EXPECT_EQ(listed, "firewall firewall rules");
+    EXPECT_EQ(listTable(), "");
+}
+
+TEST_F(FirewallTest, AMarkFromBeforeABootIsNoSignOfRules) {
+    ASSERT_EQ(replaceFile(statePath("/run/velt/firewall.loaded"), "another boot", 0644), 0);
+    ASSERT_EQ(runProcess({"nft", "add", "table", "inet", "velt_fileserv"}).exitCode, 0);
+    setMode("mode = off");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), "") << "the table is somebody else's";
+}
+
+/// Runs in a child without the right to administer the network: its exit status is what `test` returns.
+template<class Test> int withoutRights(const Test& test) {
+    const pid_t child = ::fork();
+    if (child == 0) {
+        const bool dropped = ::setgid(65534) == 0 && ::setuid(65534) == 0;
+        ::_exit(dropped ? test() : 99);
+    }
+    int status = -1;
+    ::waitpid(child, &status, 0);
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+TEST_F(FirewallTest, WithoutTheRightsTheErrorSaysSo) {
+    std::filesystem::permissions(root_, std::filesystem::perms::all);
+    std::filesystem::create_directories(statePath("/run/velt"));
+    for (const char* place : {"/run/velt", "/var/lib/velt/lock"}) {
+        std::filesystem::permissions(statePath(place), std::filesystem::perms::all);
+    }
+    EXPECT_EQ(withoutRights([] {
+                  const bool refused = VELTFwRuleHup() < 0;
+                  return refused && lastErrorSentence() ==
+                                        "The firewall rules are not loaded: this process may not "
+                                        "administer the network."
+                             ? 7
+                             : 1;
+              }),
+              7);
+    std::filesystem::remove(statePath("/run/velt/firewall.loaded"));
+    setMode("mode = off");
+    EXPECT_EQ(withoutRights([] { return VELTFwRuleHup() == 0 ? 7 : 1; }), 7) << "off needs no rights";
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,140 @@
+// The firewall's settings and rules as text.
+
+#include "standalone/core/last_error.h"
+#include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/ruleset.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+
+namespace velt {
+namespace {
+
+using Ranges = std::vector<VELT_FTP_PORT_RANGE>;
+
+TEST(FirewallRules, OfModeOffRemoveTheTable) {
+    EXPECT_EQ(renderRuleset({FirewallMode::off, {}}, Ranges{{21, 21}}), "add table inet velt_fileserv\n"
+                                                                        "delete table inet velt_fileserv\n");
+}
+
+TEST(FirewallRules, OfModeAcceptDropNothing) {
+    EXPECT_EQ(
+        renderRuleset({FirewallMode::accept, {{8080, 8080}}}, Ranges{{21, 21}, {55536, 55899}, {222, 222}}),
+        R"(add table inet velt_fileserv
+delete table inet velt_fileserv
+table inet velt_fileserv {
+    set tcp_open {
+        type inet_service
+        flags interval
+        auto-merge
+        elements = { 21, 55536-55899, 222 }
+    }
+    chain input {
+        type filter hook input priority filter - 1; policy accept;
+        tcp dport @tcp_open accept
+    }
+}
+)");
+}
+
+TEST(FirewallRules, OfModeDropOpenTheFurtherPortsToo) {
+    EXPECT_EQ(renderRuleset({FirewallMode::drop, {{22, 22}, {8000, 8010}}}, Ranges{{2121, 2121}}),
+              R"(add table inet velt_fileserv
+delete table inet velt_fileserv
+table inet velt_fileserv {
+    set tcp_open {
+        type inet_service
+        flags interval
+        auto-merge
+        elements = { 2121, 22, 8000-8010 }
+    }
+    chain input {
+        type filter hook input priority filter - 1; policy drop;
+        ct state vmap { established : accept, related : accept, invalid : drop }
+        iif "lo" accept
+        meta l4proto { icmp, ipv6-icmp } accept
+        tcp dport @tcp_open accept
+    }
+}
+)");
+}
+
+TEST(FirewallRules, WithoutAServiceHaveAnEmptySet) {
+    const std::string text = renderRuleset({}, {});
+    EXPECT_EQ(text.find("elements"), std::string::npos);
+    EXPECT_NE(text.find("set tcp_open"), std::string::npos);
+}
+
+std::string describe(const Ranges& ranges) {
+    std::string text;
+    for (const VELT_FTP_PORT_RANGE& range : ranges) {
+        text += std::to_string(range.first) + "-" + std::to_string(range.last) + " ";
+    }
+    return text;
+}
+
+TEST(FirewallPorts, AreThoseOfTheEnabledServices) {
+    FtpSettings ftp;
+    std::snprintf(ftp.record.portnum, sizeof ftp.record.portnum, "2121");
+    SftpSettings sftp{false, 2222};
+    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "");
+    ftp.record.service_flags = VELT_FTP_SERVICE_TLS;
+    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2121-2121 55536-55899 ");
+    ftp.record.passive_port_min = 40000;
+    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2121-2121 55536-55899 ") << "half a range is none";
+    ftp.record.passive_port_max = 40100;
+    sftp.enabled = true;
+    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2121-2121 40000-40100 2222-2222 ");
+    ftp.record.service_flags = 4;
+    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2222-2222 ");
+}
+
+TEST(FirewallSettingsFile, IsReadAsWritten) {
+    const auto settings = parseFirewallSettings("# mine\nversion = 1\n\nmode=drop # careful\n"
+                                                "ports = 22 8000-8010\r\n",
+                                                "file");
+    ASSERT_TRUE(settings) << lastErrorSentence();
+    EXPECT_EQ(settings->mode, FirewallMode::drop);
+    EXPECT_EQ(describe(settings->furtherPorts), "22-22 8000-8010 ");
+    EXPECT_EQ(parseFirewallSettings("version = 1\n", "file")->mode, FirewallMode::accept);
+    EXPECT_EQ(parseFirewallSettings("version = 1\nmode = off\n", "file")->mode, FirewallMode::off);
+}
+
+TEST(FirewallSettingsFile, ThatIsDamagedIsNamedWithItsLine) {
+    const std::pair<const char*, const char*> damaged[] = {
+        {"", ": the key version is missing"},
+        {"mode = drop\n", ": the key version is missing"},
+        {"version = 2\n", ", line 1: version \"2\" is not known here"},
+        {"version = 1\nmode = open\n", ", line 2: the mode is none of off, accept and drop"},
+        {"version = 1\nmode\n", ", line 2: this is no line of the form \"key = value\""},
+        {"version = 1\nports = 22 0\n", ", line 2: \"0\" is neither a port nor a range of ports"},
+        {"version = 1\nports = 22; flush ruleset\n",
+         ", line 2: \"22;\" is neither a port nor a range of ports"},
+        {"version = 1\n\nmode = off\nmode = drop\n", ", line 4: the key mode stands there a second time"},
+        {"version = 1\ncolour = red\n", ", line 2: the key colour is not known"},
+    };
+    for (const auto& [text, complaint] : damaged) {
+        EXPECT_FALSE(parseFirewallSettings(text, "/x/firewall.conf"));
+        EXPECT_EQ(lastErrorSentence(), std::string("Settings file /x/firewall.conf") + complaint + ".");
+    }
+}
+
+TEST(ForeignTables, ThatDropAreFound) {
+    const auto chain = [](const char* table, const char* hook, const char* policy) {
+        return std::string(R"({"chain":{"family":"inet","table":")") + table +
+               R"(","name":"input","hook":")" + hook + R"(","policy":")" + policy + "\"}}";
+    };
+    const std::string list =
+        R"({"nftables":[{"metainfo":{}},{"chain":{"family":"ip","table":"x","name":"y"}},)" +
+        chain("filter", "input", "drop") + "," + chain("open", "input", "accept") + "," +
+        chain("out", "output", "drop") + "," + chain("velt_fileserv", "input", "drop") + "]}";
+    EXPECT_EQ(foreignDropChains(list), std::vector<std::string>{"inet filter input"});
+    for (const char* text :
+         {"", "no list", "[]", "{}", R"({"nftables":{}})", R"({"nftables":[1,{"chain":2}]})"}) {
+        EXPECT_TRUE(foreignDropChains(text).empty()) << text;
+    }
+}
+
+} // namespace
+} // namespace velt

@@ -1,0 +1,153 @@
+#include "standalone/core/last_error.h"
+#include "standalone/settings/settings.h"
+
+#include <gtest/gtest.h>
+
+#include <climits>
+#include <cstring>
+#include <functional>
+
+namespace velt {
+namespace {
+
+using Change = std::function<void(FtpSettings&)>;
+
+std::string problemAfter(const Change& change) {
+    FtpSettings settings = defaultFtpSettings();
+    change(settings);
+    clearLastError();
+    return checkFtpSettings(settings) < 0 ? lastErrorSentence() : "";
+}
+
+Change port(const char* text) {
+    return [text](FtpSettings& settings) {
+        std::memset(settings.record.portnum, 0, sizeof(settings.record.portnum));
+        std::memcpy(settings.record.portnum, text, std::strlen(text));
+    };
+}
+
+Change range(int first, int last) {
+    return [first, last](FtpSettings& settings) {
+        settings.record.passive_port_min = first;
+        settings.record.passive_port_max = last;
+    };
+}
+
+Change address(const std::string& text) {
+    return [text](FtpSettings& settings) { settings.externalAddress = text; };
+}
+
+TEST(CheckFtp, TakesTheDefaults) {
+    EXPECT_EQ(problemAfter([](FtpSettings&) {}), "");
+}
+
+TEST(CheckFtp, ThePortIsADecimalNumberFrom1To65535) {
+    for (const char* text : {"1", "21", "2121", "65535"})
+        EXPECT_EQ(problemAfter(port(text)), "") << text;
+    for (const char* text :
+         {"", "0", "65536", "-1", "+21", " 21", "21 ", "021", "2121abc", "0x15", "9999999", "21\n", "2.1"}) {
+        const std::string problem = problemAfter(port(text));
+        EXPECT_EQ(problem.substr(0, 16), "The FTP port is ") << text;
+    }
+    EXPECT_EQ(problemAfter(port("70000")),
+              "The FTP port is \"70000\"; it has to be a decimal number from 1 to 65535.");
+    EXPECT_EQ(problemAfter(port("21\nX")),
+              "The FTP port is \"21\\x0aX\"; it has to be a decimal number from 1 to 65535.");
+}
+
+TEST(CheckFtp, TextsEndWithinTheirFields) {
+    EXPECT_EQ(problemAfter(port("00000021")), "The FTP port does not end within its 8 bytes.");
+    EXPECT_EQ(problemAfter([](FtpSettings& settings) {
+                  std::memset(settings.record.anonymous_chroot_share, 'x', 492);
+              }),
+              "The name of the anonymous share does not end within its 492 bytes.");
+    EXPECT_EQ(problemAfter([](FtpSettings& settings) {
+                  std::memset(settings.record.anonymous_chroot_share, 'x', 491);
+              }),
+              "");
+}
+
+TEST(CheckFtp, ThePassiveRangeGoesUpwardsFrom1024To65535) {
+    EXPECT_EQ(problemAfter(range(1024, 65535)), "");
+    EXPECT_EQ(problemAfter(range(50000, 50001)), "");
+    EXPECT_EQ(problemAfter(range(1023, 2000)),
+              "The passive port range is 1023 to 2000; both ends have to be from 1024 to 65535.");
+    EXPECT_EQ(problemAfter(range(60000, 65536)),
+              "The passive port range is 60000 to 65536; both ends have to be from 1024 to 65535.");
+    EXPECT_EQ(problemAfter(range(-5, INT_MAX)),
+              "The passive port range is -5 to 2147483647; both ends have to be from 1024 to 65535.");
+    EXPECT_EQ(problemAfter(range(50001, 50000)),
+              "The passive port range is 50001 to 50000; its first port has to be lower than its last.");
+    EXPECT_EQ(problemAfter(range(50000, 50000)), "The passive port range holds the port 50000 only; the FTP "
+                                                 "daemon takes a range of two ports or more.");
+}
+
+TEST(CheckFtp, ARangeWithAnEndOfZeroIsNone) {
+    EXPECT_EQ(problemAfter(range(0, 99999)), "");
+    EXPECT_EQ(problemAfter(range(-1, 0)), "");
+    FtpSettings settings;
+    range(0, 99999)(settings);
+    EXPECT_FALSE(hasCustomPassiveRange(settings.record));
+    EXPECT_EQ(passiveRange(settings.record).first, 55536);
+    EXPECT_EQ(passiveRange(settings.record).last, 55899);
+}
+
+TEST(CheckFtp, TheRangeInForceIsApartFromThePort) {
+    for (const char* text : {"2000", "2050", "2100"})
+        EXPECT_EQ(problemAfter([&](FtpSettings& settings) {
+                      port(text)(settings);
+                      range(2000, 2100)(settings);
+                  }),
+                  std::string("The passive port range 2000 to 2100 contains the FTP port ") + text +
+                      "; they have to be apart.");
+    EXPECT_EQ(problemAfter(port("55600")),
+              "The passive port range 55536 to 55899 contains the FTP port 55600; "
+              "they have to be apart.");
+    EXPECT_EQ(problemAfter([](FtpSettings& settings) {
+                  port("55600")(settings);
+                  range(2000, 2100)(settings);
+              }),
+              "");
+}
+
+TEST(CheckFtp, TheTimeOutIsNotNegative) {
+    for (const int seconds : {0, 1, INT_MAX})
+        EXPECT_EQ(problemAfter([&](FtpSettings& settings) { settings.timeout = seconds; }), "");
+    EXPECT_EQ(problemAfter([](FtpSettings& settings) { settings.timeout = -5; }),
+              "The FTP time-out is -5 seconds; it has to be 0 (never) or more.");
+}
+
+TEST(CheckFtp, LimitsBelowOneMeanNoLimit) {
+    for (const int limit : {INT_MIN, -1, 0, INT_MAX})
+        EXPECT_EQ(problemAfter([&](FtpSettings& settings) {
+                      settings.record.enable_flow_ctrl = 1;
+                      settings.record.maxuploadrate = limit;
+                      settings.record.maxdownloadrate = limit;
+                      settings.record.max_conn_per_ip = limit;
+                  }),
+                  "");
+}
+
+TEST(CheckFtp, TheExternalAddressIsIPv4OrEmpty) {
+    EXPECT_EQ(problemAfter(address("")), "");
+    EXPECT_EQ(problemAfter(address("203.0.113.7")), "");
+    for (const char* text : {"eth0", "999.1.1.1", "1.2.3", "1.2.3.4.5", "1.2.3.4 ", " 1.2.3.4", "::1",
+                             "example.org", "1.2.3.4\nPort 1", "%{env:HOME}", "0x7f.1.1.1"})
+        EXPECT_EQ(problemAfter(address(text)).substr(0, 24), "The external address is ") << text;
+    EXPECT_EQ(problemAfter(address("eth0")),
+              "The external address is \"eth0\"; it has to be an IPv4 address such as 192.0.2.1, or empty.");
+    EXPECT_NE(problemAfter(address(std::string("1.2.3.4\0x", 9))), "");
+}
+
+TEST(CheckSftp, ThePortIsFrom1To65535) {
+    for (const int number : {1, 22, 65535})
+        EXPECT_EQ(checkSftpSettings({true, number}), 0);
+    for (const int number : {INT_MIN, -1, 0, 65536, INT_MAX}) {
+        EXPECT_LT(checkSftpSettings({true, number}), 0);
+        EXPECT_EQ(lastErrorSentence(),
+                  "The SFTP port is " + std::to_string(number) + "; it has to be from 1 to 65535.");
+    }
+}
+
+} // namespace
+} // namespace velt

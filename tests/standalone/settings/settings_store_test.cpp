@@ -1,0 +1,69 @@
+#include "platform/core.h"
+#include "standalone/settings/settings.h"
+#include "standalone/settings/settings_files.h"
+#include "standalone/standalone.h"
+#include "tests/standalone/settings/settings_fixture.h"
+
+#include <sys/stat.h>
+
+namespace velt {
+namespace {
+
+class SettingsStore : public test::SettingsTest {};
+
+TEST_F(SettingsStore, TheFirstOpeningWritesTheDefaults) {
+    ASSERT_EQ(openState(root_.path()), 0) << lastErrorSentence();
+    EXPECT_EQ(root_.read("etc/velt/ftp.conf"), formatFtpSettings(defaultFtpSettings()));
+    EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSftpSettings({}));
+    struct stat status {};
+    ASSERT_EQ(::stat(place("/etc/velt/ftp.conf").c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 0777, 0644U);
+}
+
+TEST_F(SettingsStore, ALaterOpeningLeavesWhatIsThere) {
+    root_.write("etc/velt/ftp.conf", "damaged");
+    ASSERT_EQ(openState(root_.path()), 0);
+    EXPECT_EQ(root_.read("etc/velt/ftp.conf"), "damaged");
+    EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSftpSettings({}));
+}
+
+TEST_F(SettingsStore, AnOpeningThatCannotWriteSaysWhy) {
+    root_.write("etc", "a file where a folder should be");
+    EXPECT_LT(openState(root_.path()), 0);
+    EXPECT_EQ(lastErrorSentence(), "Cannot make the folder " + place("/etc/velt") + ": Not a directory.");
+}
+
+TEST_F(SettingsStore, TheExternalAddressComesFromTheSystemInformation) {
+    EXPECT_EQ(loadFtpSettings()->externalAddress, "");
+    root_.write("etc/veltinfo.conf", "ftp_ext_ip = \"203.0.113.7\"\n");
+    EXPECT_EQ(loadFtpSettings()->externalAddress, "203.0.113.7");
+}
+
+TEST_F(SettingsStore, ADamagedExternalAddressIsAnErrorThatCanBeRepaired) {
+    root_.write("etc/veltinfo.conf", "ftp_ext_ip=eth0\n");
+    EXPECT_FALSE(loadFtpSettings().has_value());
+    EXPECT_EQ(lastErrorSentence(),
+              "File " + place("/etc/veltinfo.conf") + ": the value of ftp_ext_ip is no IPv4 address.");
+    ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
+    EXPECT_EQ(loadFtpSettings()->externalAddress, "203.0.113.7");
+}
+
+TEST_F(SettingsStore, AnUnreadableFileIsNoMissingFile) {
+    std::filesystem::create_directories(place("/etc/velt/ftp.conf"));
+    EXPECT_FALSE(loadFtpSettings().has_value());
+    EXPECT_EQ(lastErrorSentence(),
+              "Cannot read the settings file " + place("/etc/velt/ftp.conf") + ": Is a directory.");
+}
+
+TEST_F(SettingsStore, AHandEditedValueThatNoDaemonTakesIsRepairedByStoringAGoodOne) {
+    std::string text = formatFtpSettings(defaultFtpSettings());
+    text.replace(text.find("timeout = 300"), 13, "timeout = -30");
+    root_.write("etc/velt/ftp.conf", text);
+    EXPECT_EQ(VELTFTPTimeOutGet(), -30);
+    EXPECT_LT(VELTFTPASCIIEnabledSet(1), 0);
+    EXPECT_GE(VELTFTPTimeOutSet(30), 0);
+    EXPECT_GE(VELTFTPASCIIEnabledSet(1), 0);
+}
+
+} // namespace
+} // namespace velt

@@ -1,0 +1,162 @@
+#include "standalone/shares/share_file.h"
+
+#include <gtest/gtest.h>
+
+namespace velt {
+namespace {
+
+using namespace std::string_literals;
+
+constexpr const char* twoShares = R"({
+  "version": 1,
+  "shares": [
+    {"name": "public", "comment": "For all", "path": "/srv/public", "ftp": true,
+     "users": {"ftp": "read", "anna": "write", "bob": "none"}, "groups": {"staff": "write"}},
+    {"name": "Bücher", "path": "/srv/books"}
+  ]
+})";
+
+std::string flawIn(std::string_view text) {
+    std::string flaw;
+    EXPECT_FALSE(parseShares(text, flaw)) << text;
+    return flaw;
+}
+
+std::string withShare(const std::string& share) {
+    return R"({"version":1,"shares":[)" + share + "]}";
+}
+
+TEST(ShareFile, ReadsEveryField) {
+    std::string flaw;
+    const auto shares = parseShares(twoShares, flaw);
+    ASSERT_TRUE(shares) << flaw;
+    ASSERT_EQ(shares->size(), 2U);
+    const ShareEntry& first = (*shares)[0];
+    EXPECT_EQ(first.name, "public");
+    EXPECT_EQ(first.comment, "For all");
+    EXPECT_EQ(first.path, "/srv/public");
+    EXPECT_TRUE(first.offeredToFtp);
+    EXPECT_EQ(first.users,
+              (std::map<std::string, ShareGrant>{
+                  {"ftp", ShareGrant::read}, {"anna", ShareGrant::write}, {"bob", ShareGrant::none}}));
+    EXPECT_EQ(first.groups, (std::map<std::string, ShareGrant>{{"staff", ShareGrant::write}}));
+    const ShareEntry& second = (*shares)[1];
+    EXPECT_EQ(second.name, "Bücher");
+    EXPECT_EQ(second.comment, "");
+    EXPECT_FALSE(second.offeredToFtp);
+    EXPECT_TRUE(second.users.empty());
+}
+
+TEST(ShareFile, WritesWhatItReads) {
+    std::string flaw;
+    const auto shares = parseShares(twoShares, flaw);
+    ASSERT_TRUE(shares);
+    const std::string text = renderShares(*shares);
+    const auto again = parseShares(text, flaw);
+    ASSERT_TRUE(again) << flaw;
+    EXPECT_EQ(renderShares(*again), text);
+    EXPECT_NE(text.find("Bücher"), std::string::npos) << "a person reads this file";
+    EXPECT_EQ((*again)[0].users, (*shares)[0].users);
+}
+
+TEST(ShareFile, KeepsOddButAllowedTextAsItIs) {
+    for (const std::string& name : {"-rf"s, "a\"b"s, "a\\b"s, "%u"s, "%{env:HOME}"s, "a b"s, ".hidden"s,
+                                    "'; --"s, std::string(255, 'x')}) {
+        ShareEntry share;
+        share.name = name;
+        share.comment = "c \"" + name;
+        share.path = "/srv/" + name;
+        share.users["u" + name.substr(0, 200)] = ShareGrant::read;
+        ASSERT_FALSE(flawOf({share})) << name;
+        std::string flaw;
+        const auto read = parseShares(renderShares({share}), flaw);
+        ASSERT_TRUE(read) << flaw;
+        EXPECT_EQ((*read)[0].name, share.name);
+        EXPECT_EQ((*read)[0].comment, share.comment);
+        EXPECT_EQ((*read)[0].path, share.path);
+        EXPECT_EQ((*read)[0].users, share.users);
+    }
+}
+
+TEST(ShareFile, NamesTheFlawOfADamagedText) {
+    EXPECT_NE(flawIn("").find("no valid JSON"), std::string::npos);
+    EXPECT_NE(flawIn("{\"version\":1,\n\"shares\":[}").find("Line 2"), std::string::npos);
+    EXPECT_EQ(flawIn("[]"), "the file is no object");
+    EXPECT_EQ(flawIn(R"({"shares":[]})"), "\"version\" is not 1");
+    EXPECT_EQ(flawIn(R"({"version":2,"shares":[]})"), "\"version\" is not 1");
+    EXPECT_EQ(flawIn(R"({"version":1,"shares":{}})"), "\"shares\" is no array");
+    EXPECT_EQ(flawIn(R"({"version":1})"), "\"shares\" is no array");
+    EXPECT_EQ(flawIn(R"({"version":1,"shares":[],"more":1})"), "the unknown key \"more\"");
+    EXPECT_EQ(flawIn(withShare("7")), "share 1 is no object");
+    EXPECT_EQ(flawIn(withShare(R"({"path":"/a"})")), "share 1 has no text \"name\"");
+    EXPECT_EQ(flawIn(withShare(R"({"name":"a","path":7})")), "share 1 has no text \"path\"");
+    EXPECT_EQ(flawIn(withShare(R"({"name":"a","path":"/a","pth":"/b"})")),
+              "share 1 has the unknown key \"pth\"");
+    EXPECT_EQ(flawIn(withShare(R"({"name":"a","path":"/a","ftp":"yes"})")),
+              "share 1 has \"ftp\" that is neither true nor false");
+    EXPECT_EQ(flawIn(withShare(R"({"name":"a","path":"/a","users":["ftp"]})")),
+              "share 1 has \"users\" that is no object");
+    EXPECT_EQ(flawIn(withShare(R"({"name":"a","path":"/a","users":{"ftp":"all"}})")),
+              "share 1 grants \"ftp\" something other than \"none\", \"read\" or \"write\"");
+    EXPECT_EQ(flawIn(withShare(R"({"name":"a","path":"/a"},{"name":"a","path":"/b"})")),
+              "share 2 (\"a\") has the name of another share");
+}
+
+TEST(ShareFile, IsStrictJson) {
+    for (const char* text : {R"({"version":1,"shares":[]} x)", R"(// c
+{"version":1,"shares":[]})",
+                             R"({"version":1,"version":1,"shares":[]})", R"({"version":1,"shares":[],})",
+                             "{'version':1,'shares':[]}"}) {
+        EXPECT_NE(flawIn(text).find("no valid JSON"), std::string::npos) << text;
+    }
+    EXPECT_FALSE(flawIn(std::string(100'000, '[')).empty());
+}
+
+TEST(ShareFile, RefusesNamesThatCannotBeAFolder) {
+    for (const std::string& name : {""s, "."s, ".."s, "a/b"s, "/"s, "../x"s, "a\nb"s, "a\0b"s, "\xff"s,
+                                    "\x1b[0m"s, std::string(256, 'x')}) {
+        EXPECT_FALSE(isShareName(name)) << name;
+        ShareEntry share;
+        share.name = name;
+        share.path = "/srv/x";
+        EXPECT_TRUE(flawOf({share})) << name;
+    }
+}
+
+TEST(ShareFile, RefusesPathsThatAreNotOneAbsoluteFolder) {
+    for (const std::string& path : {""s, "srv"s, "./srv"s, "/srv/../etc"s, "/srv/.."s, "/.."s, "/srv\nx"s,
+                                    "/srv\0x"s, "/srv/\xff"s, "/" + std::string(4095, 'x')}) {
+        ShareEntry share;
+        share.name = "a";
+        share.path = path;
+        EXPECT_TRUE(flawOf({share})) << path;
+    }
+    ShareEntry allowed;
+    allowed.name = "a";
+    for (const std::string& path : {"/srv/..x"s, "/srv/a..b/"s, "/"s, "/" + std::string(4094, 'x')}) {
+        allowed.path = path;
+        EXPECT_FALSE(flawOf({allowed})) << path;
+    }
+}
+
+TEST(ShareFile, RefusesCommentsAndAccountsThatAreNotOneLine) {
+    ShareEntry share;
+    share.name = "a";
+    share.path = "/a";
+    for (const std::string& comment : {"a\nb"s, "\xC3"s, std::string(1025, 'x')}) {
+        share.comment = comment;
+        EXPECT_TRUE(flawOf({share})) << comment;
+    }
+    share.comment.clear();
+    for (const std::string& account : {""s, "a\nb"s, "\xff"s, std::string(256, 'x')}) {
+        ShareEntry other = share;
+        other.users[account] = ShareGrant::read;
+        EXPECT_TRUE(flawOf({other})) << account;
+        other = share;
+        other.groups[account] = ShareGrant::read;
+        EXPECT_TRUE(flawOf({other})) << account;
+    }
+}
+
+} // namespace
+} // namespace velt

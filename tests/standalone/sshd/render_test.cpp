@@ -1,0 +1,67 @@
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/settings/candidate.h"
+#include "standalone/sshd/host_keys.h"
+#include "standalone/sshd/render.h"
+#include "tests/standalone/support/golden.h"
+#include "tests/standalone/support/temporary_folder.h"
+
+#include <sys/stat.h>
+
+namespace velt::test {
+namespace {
+
+const SshdPlaces examplePlaces{{"/var/lib/velt/ssh/host_ed25519_key", "/var/lib/velt/ssh/host_rsa_key"},
+                               true};
+
+TEST(SshdRendering, isAsRecorded) {
+    expectGolden(GOLDEN_FOLDER "/sftp.conf", renderSshd({true, 2222}, examplePlaces));
+}
+
+TEST(SshdRendering, isAsRecordedWithoutRootsRights) {
+    SshdPlaces places = examplePlaces;
+    places.privileged = false;
+    expectGolden(GOLDEN_FOLDER "/sftp_unprivileged.conf", renderSshd({true, 2222}, places));
+}
+
+class SftpCandidate : public testing::Test {
+protected:
+    void SetUp() override {
+        if (!std::filesystem::exists("/usr/sbin/sshd")) {
+            GTEST_SKIP() << "the OpenSSH server is not installed";
+        }
+        setStateRoot(root_.path());
+    }
+    void TearDown() override { setStateRoot("/"); }
+
+    TemporaryFolder root_;
+};
+
+TEST_F(SftpCandidate, isTakenAndLeavesNothingButTheKeys) {
+    EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
+    EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
+}
+
+TEST_F(SftpCandidate, isRefusedInTheDaemonsOwnWords) {
+    EXPECT_LT(testSftpCandidate({true, 65536}), 0);
+    EXPECT_NE(lastErrorSentence().find("Badly formatted port number"), std::string::npos)
+        << lastErrorSentence();
+}
+
+TEST_F(SftpCandidate, keepsItsKeys) {
+    const auto keys = hostKeys();
+    ASSERT_TRUE(keys) << lastErrorSentence();
+    ASSERT_EQ(keys->size(), 2U);
+    const std::string first = root_.read("var/lib/velt/ssh/host_ed25519_key");
+    EXPECT_NE(first, "");
+    for (const auto& key : *keys) {
+        struct stat facts {};
+        ASSERT_EQ(stat(key.c_str(), &facts), 0);
+        EXPECT_EQ(facts.st_mode & 07777, 0600U);
+    }
+    ASSERT_TRUE(hostKeys());
+    EXPECT_EQ(root_.read("var/lib/velt/ssh/host_ed25519_key"), first);
+}
+
+} // namespace
+} // namespace velt::test

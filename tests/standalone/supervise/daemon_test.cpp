@@ -1,0 +1,134 @@
+#include "tests/standalone/supervise/daemon_test.h"
+
+#include "standalone/core/state_root.h"
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <sys/prctl.h>
+#include <sys/socket.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <thread>
+
+namespace velt::test {
+namespace {
+
+sockaddr_in loopback(int port) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    address.sin_port = htons(static_cast<in_port_t>(port));
+    return address;
+}
+
+bool bindTo(int descriptor, int port) {
+    const sockaddr_in address = loopback(port);
+    return ::bind(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0;
+}
+
+int connectTo(int port) {
+    const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    const sockaddr_in address = loopback(port);
+    if (::connect(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0) {
+        return descriptor;
+    }
+    ::close(descriptor);
+    return -1;
+}
+
+} // namespace
+
+int freePort() {
+    // Tests run side by side, so each process begins its search elsewhere. In wide steps, for tests that ask about ranges.
+    static int next = (::getpid() * 370) % 10000;
+    for (;;) {
+        next = (next + 20) % 10000;
+        const int port = 20000 + next;
+        const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+        const bool isFree = bindTo(descriptor, port);
+        ::close(descriptor);
+        if (isFree) {
+            return port;
+        }
+    }
+}
+
+bool waitUntil(const std::function<bool()>& condition, std::chrono::milliseconds limit) {
+    const auto deadline = std::chrono::steady_clock::now() + limit;
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() >= deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    return true;
+}
+
+bool accepts(int port) {
+    const int descriptor = connectTo(port);
+    if (descriptor < 0) {
+        return false;
+    }
+    ::close(descriptor);
+    return true;
+}
+
+Client::Client(int port) : descriptor_(connectTo(port)) {}
+
+Client::~Client() {
+    ::close(descriptor_);
+}
+
+bool Client::isServed() {
+    char byte = 'x';
+    return ::send(descriptor_, &byte, 1, MSG_NOSIGNAL) == 1 && ::recv(descriptor_, &byte, 1, 0) == 1;
+}
+
+Listener::Listener(int port) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    EXPECT_TRUE(bindTo(descriptor_, port));
+    EXPECT_EQ(::listen(descriptor_, 4), 0);
+}
+
+Listener::~Listener() {
+    ::close(descriptor_);
+}
+
+DaemonPlan testPlan(int port, const std::string& hash, const std::vector<std::string>& options) {
+    DaemonPlan plan;
+    plan.executable = VELT_TEST_DAEMON;
+    plan.arguments = {VELT_TEST_DAEMON, "--port", std::to_string(port)};
+    plan.arguments.insert(plan.arguments.end(), options.begin(), options.end());
+    plan.configurationHash = hash;
+    plan.listenPorts = {port};
+    return plan;
+}
+
+void DaemonTest::SetUp() {
+    std::string folder = testing::TempDir() + "velt-daemon-XXXXXX";
+    ASSERT_NE(::mkdtemp(folder.data()), nullptr);
+    root_ = folder;
+    setStateRoot(root_);
+    ASSERT_EQ(::setenv("VELT_LIBEXEC_DIR", VELT_TEST_LIBEXEC, 1), 0);
+    ASSERT_EQ(::prctl(PR_SET_CHILD_SUBREAPER, 1), 0);
+}
+
+void DaemonTest::TearDown() {
+    EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, std::chrono::seconds(2)))
+        << "a process was left behind";
+    for (const ProcessId& process : leftProcesses()) {
+        signalProcess(process, SIGKILL);
+    }
+    waitUntil([] { return leftProcesses().empty(); }, std::chrono::seconds(2));
+    std::filesystem::remove_all(root_);
+}
+
+std::vector<ProcessId> DaemonTest::leftProcesses() {
+    while (::waitpid(-1, nullptr, WNOHANG) > 0) {
+    }
+    return descendantsOf(::getpid());
+}
+
+} // namespace velt::test

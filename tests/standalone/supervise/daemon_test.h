@@ -1,0 +1,71 @@
+// What tests with real processes have in common.
+#ifndef VELT_TESTS_STANDALONE_SUPERVISE_DAEMON_TEST_H
+#define VELT_TESTS_STANDALONE_SUPERVISE_DAEMON_TEST_H
+
+#include "standalone/daemon_plan.h"
+#include "standalone/supervise/process_identity.h"
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <filesystem>
+#include <functional>
+#include <string>
+#include <vector>
+
+namespace velt::test {
+
+/// A loopback port that was free a moment ago, outside the kernel's range for connections.
+int freePort();
+
+bool waitUntil(const std::function<bool()>& condition, std::chrono::milliseconds limit);
+
+/// Whether somebody answers on the loopback port.
+bool accepts(int port);
+
+/// A connection to the test daemon, that is, one of its sessions.
+class Client {
+public:
+    explicit Client(int port);
+    ~Client();
+    Client(const Client&) = delete;
+    Client& operator=(const Client&) = delete;
+
+    /// Whether the session still answers.
+    bool isServed();
+
+private:
+    int descriptor_ = -1;
+};
+
+/// A socket of this process that listens on a loopback port.
+class Listener {
+public:
+    explicit Listener(int port);
+    ~Listener();
+    Listener(const Listener&) = delete;
+    Listener& operator=(const Listener&) = delete;
+
+private:
+    int descriptor_ = -1;
+};
+
+/// The plan that starts the test daemon on this port.
+DaemonPlan testPlan(int port, const std::string& hash, const std::vector<std::string>& options = {});
+
+/// A state root of the test's own, and the promise that no process outlives the test: whatever detached itself
+/// is inherited, and its being there is a failure.
+class DaemonTest : public testing::Test {
+protected:
+    void SetUp() override;
+    void TearDown() override;
+
+    /// Reaps what has ended; the processes below this one that remain.
+    static std::vector<ProcessId> leftProcesses();
+
+    std::filesystem::path root_;
+};
+
+} // namespace velt::test
+
+#endif

@@ -1,0 +1,120 @@
+// A daemon that behaves as its arguments say: what the supervisor is tried on.
+//
+//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--live MS] [--stubborn] [--any]
+//
+// It listens on loopback, with --any on all addresses; each connection is served by a session in a process and a terminal session of its own, which answers
+// every byte with the same byte and ends with its connection, or with a SIGTERM.
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <string_view>
+#include <thread>
+#include <vector>
+
+namespace {
+
+struct Options {
+    std::vector<int> ports;
+    int delay = 0;
+    int live = 0;
+    const char* words = nullptr;
+    bool stubborn = false;
+    bool any = false;
+};
+
+Options parse(int argc, char** argv) {
+    Options options;
+    for (int index = 1; index < argc; ++index) {
+        const std::string_view name = argv[index];
+        if (name == "--stubborn") {
+            options.stubborn = true;
+            continue;
+        }
+        if (name == "--any") {
+            options.any = true;
+            continue;
+        }
+        const char* value = index + 1 < argc ? argv[++index] : "";
+        if (name == "--port") {
+            options.ports.push_back(std::atoi(value));
+        } else if (name == "--delay") {
+            options.delay = std::atoi(value);
+        } else if (name == "--live") {
+            options.live = std::atoi(value);
+        } else if (name == "--refuse") {
+            options.words = value;
+        }
+    }
+    return options;
+}
+
+int listenOn(int port, bool any) {
+    const int descriptor = ::socket(AF_INET, SOCK_STREAM, 0);
+    const int on = 1;
+    ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(any ? INADDR_ANY : INADDR_LOOPBACK);
+    address.sin_port = htons(static_cast<in_port_t>(port));
+    if (::bind(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 ||
+        ::listen(descriptor, 16) != 0) {
+        std::perror("velt-test-daemon: cannot listen");
+        std::exit(1);
+    }
+    return descriptor;
+}
+
+[[noreturn]] void serveSession(int connection) {
+    ::setsid();
+    ::signal(SIGTERM, SIG_DFL);
+    char byte = 0;
+    while (::read(connection, &byte, 1) == 1 && ::write(connection, &byte, 1) == 1) {
+    }
+    ::_exit(0);
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    const Options options = parse(argc, argv);
+    if (options.words != nullptr) {
+        std::fprintf(stderr, "%s\n", options.words);
+        return 1;
+    }
+    if (options.stubborn) {
+        ::signal(SIGTERM, SIG_IGN);
+    }
+    ::signal(SIGCHLD, SIG_IGN);
+    std::this_thread::sleep_for(std::chrono::milliseconds(options.delay));
+    std::vector<int> listeners;
+    for (const int port : options.ports) {
+        listeners.push_back(listenOn(port, options.any));
+    }
+    if (options.live > 0) {
+        std::thread([live = options.live] {
+            std::this_thread::sleep_for(std::chrono::milliseconds(live));
+            std::fprintf(stderr, "velt-test-daemon: lived long enough\n");
+            ::_exit(7);
+        }).detach();
+    }
+    while (listeners.empty()) {
+        ::pause();
+    }
+    for (;;) {
+        const int connection = ::accept(listeners.front(), nullptr, nullptr);
+        if (connection >= 0 && ::fork() == 0) {
+            for (const int listener : listeners) {
+                ::close(listener);
+            }
+            serveSession(connection);
+        }
+        ::close(connection);
+    }
+}

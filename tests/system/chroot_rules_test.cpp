@@ -1,0 +1,207 @@
+// The chroot rules at logins.
+#include "tests/system/support/ftp_service.h"
+
+#include "standalone/core/last_error.h"
+
+#include <sys/stat.h>
+
+#include <filesystem>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class ChrootRules : public FtpService {
+protected:
+    void SetUp() override {
+        FtpService::SetUp();
+        if (IsSkipped() || HasFatalFailure()) {
+            return;
+        }
+        const auto music = addShare("music", "music", ShareGrant::none);
+        fs::create_directory(music / "below");
+        fs::create_directory(music / "odd \"#\\ %{env:HOME} ~");
+        fs::create_directory(music / "%u");
+        writeFile(music / "song", "la");
+        writeFile(music / "below" / "deep", "di");
+        writeFile(music / "odd \"#\\ %{env:HOME} ~" / "odd", "o");
+    }
+
+    /// What stands in the root of the user's session; "530" when the login is refused.
+    std::string rootOf(const std::string& user) {
+        FtpSession session(port);
+        if (const int code = session.logIn(user); code != 230) {
+            return std::to_string(code);
+        }
+        EXPECT_NE(session.command("PWD").text.find("\"/\""), std::string::npos);
+        session.command("CDUP");
+        return session.receive("NLST").value_or("(refused)");
+    }
+
+    static constexpr const char* home = "home-of\r\n";
+};
+
+TEST_F(ChrootRules, confineAUserToAFolderOfAShare) {
+    start();
+    EXPECT_EQ(rootOf("alice"), home);
+    saveRules({"u:1001:/music/below"});
+    EXPECT_EQ(rootOf("alice"), "deep\r\n") << "without a restart";
+    EXPECT_EQ(rootOf("bob"), home);
+    saveRules({});
+    EXPECT_EQ(rootOf("alice"), home);
+}
+
+TEST_F(ChrootRules, confineToAShareAsAWhole) {
+    start();
+    saveRules({"u:1003:/music"});
+    EXPECT_NE(rootOf("carol").find("song"), std::string::npos);
+}
+
+TEST_F(ChrootRules, ofAGroupHoldForItsMembers) {
+    start();
+    saveRules({"g:2001:/music/below"});
+    EXPECT_EQ(rootOf("alice"), "deep\r\n");
+    EXPECT_EQ(rootOf("bob"), "deep\r\n");
+    EXPECT_EQ(rootOf("carol"), home);
+}
+
+TEST_F(ChrootRules, ofAPrimaryGroupHoldToo) {
+    start();
+    saveRules({"g:1003:/music/below"});
+    EXPECT_EQ(rootOf("carol"), "deep\r\n");
+}
+
+TEST_F(ChrootRules, ofAUserComeBeforeThoseOfAGroup) {
+    start();
+    saveRules({"g:2001:/music/below", "u:1001:/home"});
+    EXPECT_EQ(rootOf("alice"), home);
+    EXPECT_EQ(rootOf("bob"), "deep\r\n");
+}
+
+TEST_F(ChrootRules, holdInStoredOrder) {
+    start();
+    saveRules({"g:1001:/home", "g:2001:/music/below", "u:1002:/music/below", "u:1002:/home"});
+    EXPECT_EQ(rootOf("alice"), home);
+    EXPECT_EQ(rootOf("bob"), "deep\r\n");
+}
+
+TEST_F(ChrootRules, comeBeforeTheGeneralSetting) {
+    record.user_chroot = 0;
+    start();
+    saveRules({"u:1001:/home", "u:1002:/music/below"});
+    EXPECT_EQ(rootOf("alice"), home);
+    EXPECT_EQ(rootOf("bob"), "deep\r\n");
+    EXPECT_EQ(rootOf("carol"), "music\r\n");
+}
+
+TEST_F(ChrootRules, madeThroughTheUserListHoldToo) {
+    record.user_chroot = 0;
+    start();
+    VLIBCSzList* list = VLIBCSzListAlloc(4);
+    ASSERT_EQ(VLIBCSzListPush(&list, "alice"), 0);
+    ASSERT_EQ(VELTFTPAddChrootUser(list), 0) << lastErrorSentence();
+    EXPECT_EQ(rootOf("alice"), home);
+    ASSERT_EQ(VELTFTPDeleteChrootUser(list), 0) << lastErrorSentence();
+    VLIBCSzListFree(list);
+    EXPECT_EQ(rootOf("alice"), "music\r\n");
+}
+
+TEST_F(ChrootRules, withSpecialCharactersNameThatFolderAndNoOther) {
+    start();
+    saveRules({"u:1001:/music/odd \"#\\ %{env:HOME} ~"});
+    EXPECT_EQ(rootOf("alice"), "odd\r\n");
+    fs::create_directory("/mnt/srv/music/alice");
+    writeFile("/mnt/srv/music/alice/wrong", "");
+    saveRules({"u:1001:/music/%u"});
+    EXPECT_EQ(rootOf("alice"), "530") << "the daemon would put the name in its place";
+}
+
+TEST_F(ChrootRules, refuseTheLoginWithoutTheirFolder) {
+    start();
+    saveRules({"u:1001:/music/absent", "u:1002:/absent", "u:1003:/music/song"});
+    EXPECT_EQ(rootOf("alice"), "530");
+    EXPECT_EQ(rootOf("bob"), "530");
+    EXPECT_EQ(rootOf("carol"), "530") << "a file is no folder";
+}
+
+TEST_F(ChrootRules, refuseAFolderThatLeadsOutOfItsShare) {
+    start();
+    fs::create_directory_symlink("/etc", "/mnt/srv/music/trap");
+    fs::create_directory_symlink("below", "/mnt/srv/music/alias");
+    saveRules({"u:1001:/music/trap", "u:1002:/music/alias"});
+    EXPECT_EQ(rootOf("alice"), "530");
+    EXPECT_EQ(rootOf("bob"), "deep\r\n");
+}
+
+TEST_F(ChrootRules, refuseAllLoginsWithoutTheirFile) {
+    start();
+    const fs::path file = worldRoot / "etc/velt/chroot_rules";
+    fs::rename(file, file.string() + ".away");
+    EXPECT_EQ(rootOf("alice"), "530");
+    fs::rename(file.string() + ".away", file);
+    EXPECT_EQ(rootOf("alice"), home);
+}
+
+TEST_F(ChrootRules, refuseAllLoginsWithADamagedFile) {
+    start();
+    const fs::path file = worldRoot / "etc/velt/chroot_rules";
+    const std::string header = "velt-chroot-rules 1\n";
+    for (const std::string& text :
+         {std::string(), std::string("other 1\n"), header + "u:1002:/home", header + "x:1002:/home\n",
+          header + "u:1002:/music/../below\n", header + "u::/home\n", header + "u:1002:relative\n",
+          header + "u:1002:/" + std::string(10000, 'a') + "\n"}) {
+        writeFile(file, text);
+        EXPECT_EQ(rootOf("alice"), "530") << text.substr(0, 60);
+    }
+    writeFile(file, header);
+    EXPECT_EQ(rootOf("alice"), home);
+    ASSERT_EQ(chmod(file.c_str(), 0666), 0);
+    EXPECT_EQ(rootOf("alice"), "530") << "anybody could have written it";
+}
+
+TEST_F(ChrootRules, ofAFailedLoginDoNotReachTheNextOne) {
+    start();
+    saveRules({"u:1001:/music/below"});
+    FtpSession session(port);
+    EXPECT_EQ(session.logIn("alice", "wrong"), 530);
+    ASSERT_EQ(session.logIn("bob"), 230);
+    session.command("CDUP");
+    EXPECT_EQ(session.receive("NLST"), home);
+    FtpSession other(port);
+    EXPECT_EQ(other.logIn("bob", "wrong"), 530);
+    ASSERT_EQ(other.logIn("alice"), 230);
+    EXPECT_EQ(other.receive("NLST"), "deep\r\n");
+}
+
+TEST_F(ChrootRules, doNotTellAStrangerWhoHasOne) {
+    start();
+    saveRules({"u:1001:/music/absent"});
+    FtpSession session(port);
+    session.command("USER alice");
+    const Reply ruled = session.command("PASS wrong");
+    session.command("USER bob");
+    const Reply unruled = session.command("PASS wrong");
+    EXPECT_EQ(ruled.code, 530);
+    EXPECT_EQ(ruled.text, unruled.text);
+}
+
+TEST_F(ChrootRules, doNotConcernAnonymousUsers) {
+    addShare("public", "public", ShareGrant::read);
+    letAnonymousIn("public");
+    start();
+    saveRules({"u:104:/music/absent"});
+    FtpSession session(port);
+    EXPECT_EQ(session.logIn("anonymous", ""), 230);
+}
+
+TEST_F(ChrootRules, findAShareThatIsMadeLater) {
+    start();
+    saveRules({"u:1001:/later"});
+    EXPECT_EQ(rootOf("alice"), "530");
+    writeFile(addShare("later", "later", ShareGrant::none) / "file", "x");
+    ASSERT_EQ(refreshShareMap(), 0) << lastErrorSentence();
+    EXPECT_EQ(rootOf("alice"), "file\r\n");
+}
+
+} // namespace
+} // namespace velt::test

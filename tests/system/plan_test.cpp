@@ -1,0 +1,117 @@
+// What a plan says, and when it changes.
+#include "tests/system/support/ftp_service.h"
+
+#include "standalone/core/last_error.h"
+
+#include <filesystem>
+#include <iterator>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class FtpPlan : public FtpService {
+protected:
+    std::string hash() {
+        EXPECT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+        const auto plan = planFtpDaemon();
+        EXPECT_TRUE(plan) << lastErrorSentence();
+        return plan ? plan->configurationHash : "";
+    }
+};
+
+TEST_F(FtpPlan, namesTheDaemonAndItsPort) {
+    hash();
+    const auto plan = planFtpDaemon();
+    ASSERT_TRUE(plan) << lastErrorSentence();
+    EXPECT_EQ(plan->folder, worldRoot / "run/velt/ftp/configurations" / plan->configurationHash);
+    EXPECT_EQ(plan->arguments,
+              (std::vector<std::string>{"/usr/sbin/proftpd", "-n", "-c", plan->folder / "proftpd.conf"}));
+    EXPECT_EQ(plan->executable, "/usr/sbin/proftpd");
+    EXPECT_EQ(plan->listenPorts, std::vector<int>{2121});
+}
+
+TEST_F(FtpPlan, staysTheSameWhileNothingChanges) {
+    offerTls(true);
+    record.user_chroot = 0;
+    addShare("music", "music", ShareGrant::read);
+    EXPECT_EQ(hash(), hash());
+}
+
+TEST_F(FtpPlan, changesWithWhatADaemonReadsAtItsStart) {
+    std::string last = hash();
+    const auto expectChange = [&](const char* what) {
+        const std::string now = hash();
+        EXPECT_NE(now, last) << what;
+        last = now;
+    };
+    record.max_conn_per_ip = 3;
+    expectChange("a limit");
+    record.user_chroot = 0;
+    expectChange("the root of unconfined users");
+    addShare("music", "music", ShareGrant::none);
+    expectChange("an offered share");
+    offerTls(true);
+    expectChange("FTPS");
+    fs::remove_all(worldRoot / "var/lib/velt/tls");
+    expectChange("the certificate");
+}
+
+TEST_F(FtpPlan, doesNotChangeWithTheRules) {
+    addShare("music", "music", ShareGrant::none);
+    const std::string before = hash();
+    saveRules({"u:1001:/music"});
+    EXPECT_EQ(hash(), before);
+}
+
+TEST_F(FtpPlan, isRefusedWhenNeitherServiceIsEnabled) {
+    record.service_flags = 0;
+    ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    EXPECT_FALSE(planFtpDaemon());
+    EXPECT_EQ(lastErrorSentence(), "Neither FTP nor FTPS is enabled.");
+}
+
+TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {
+    addShare("one", "one", ShareGrant::read);
+    addShare("two", "two", ShareGrant::read);
+    letAnonymousIn("one");
+    hash();
+    const auto former = planFtpDaemon();
+    letAnonymousIn("two");
+    hash();
+    const auto next = planFtpDaemon();
+    ASSERT_TRUE(former && next) << lastErrorSentence();
+    EXPECT_NE(former->folder, next->folder);
+    EXPECT_TRUE(fs::exists(former->folder / "proftpd.conf"));
+    EXPECT_EQ(fs::read_symlink(former->folder / "anonymous"), "/mnt/srv/one");
+    EXPECT_EQ(fs::read_symlink(next->folder / "anonymous"), "/mnt/srv/two");
+    removeFormerPlans(*next);
+    EXPECT_FALSE(fs::exists(former->folder));
+    EXPECT_TRUE(fs::exists(next->folder / "proftpd.conf"));
+    EXPECT_TRUE(fs::exists("/mnt/srv/one")) << "a link is removed, not what it leads to";
+}
+
+TEST_F(FtpPlan, writesNothingWhenTheDaemonRefusesTheNewConfiguration) {
+    offerTls(true);
+    hash();
+    const auto configurations = worldRoot / "run/velt/ftp/configurations";
+    const auto count = [&] {
+        return std::distance(fs::directory_iterator(configurations), fs::directory_iterator());
+    };
+    EXPECT_EQ(count(), 1);
+    fs::create_directories(worldRoot / "etc/velt/tls");
+    writeFile(worldRoot / "etc/velt/tls/server.crt", "nonsense");
+    EXPECT_FALSE(planFtpDaemon());
+    EXPECT_EQ(count(), 1);
+}
+
+TEST_F(FtpPlan, leavesAStoredRuleSetAlone) {
+    addShare("music", "music", ShareGrant::none);
+    saveRules({"u:1001:/music"});
+    hash();
+    EXPECT_EQ(readFileText(worldRoot / "etc/velt/chroot_rules"), "velt-chroot-rules 1\nu:1001:/music\n");
+    EXPECT_EQ(modeOf(worldRoot / "etc/velt/chroot_rules"), 0600U);
+}
+
+} // namespace
+} // namespace velt::test

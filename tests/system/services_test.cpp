@@ -1,0 +1,231 @@
+// Service control over the real daemons, seen by real clients.
+#include "ftp/ftp_library.h"
+#include "platform/service.h"
+#include "platform/sftp.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
+#include "standalone/core/state_root.h"
+#include "standalone/services/services.h"
+#include "standalone/standalone.h"
+#include "tests/system/support/ftp_service.h"
+#include "tests/system/support/private_world.h"
+
+#include <gtest/gtest.h>
+
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <string>
+#include <thread>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+using std::chrono::milliseconds;
+using std::chrono::seconds;
+
+/// Listens on the port as another program would.
+class TakenPort {
+public:
+    explicit TakenPort(int atPort) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+        sockaddr_in address{};
+        address.sin_family = AF_INET;
+        address.sin_port = htons(static_cast<in_port_t>(atPort));
+        EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+        EXPECT_EQ(::listen(descriptor_, 1), 0);
+    }
+    ~TakenPort() { ::close(descriptor_); }
+    TakenPort(const TakenPort&) = delete;
+    TakenPort& operator=(const TakenPort&) = delete;
+
+private:
+    int descriptor_;
+};
+
+class ControlledServices : public FtpService {
+protected:
+    void TearDown() override {
+        if (whyNoWorld().empty()) {
+            EXPECT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
+            EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+        }
+        FtpService::TearDown();
+    }
+
+    void storeAndStart(int flags, int atPort) {
+        std::snprintf(record.portnum, sizeof record.portnum, "%d", atPort);
+        record.service_flags = flags;
+        ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+        for (const char* name : {"ftpd-pure", "ftpd-ssl", "ftpd"}) {
+            ASSERT_EQ(VLIBServicectlStop(name, 0), 0) << lastErrorSentence();
+        }
+        ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    }
+
+    static bool servesFtp(int atPort) {
+        return curl({"--silent", "--user", "alice:alice-secret",
+                     "ftp://127.0.0.1:" + std::to_string(atPort) + "/home-of"})
+                   .output == "alice";
+    }
+
+    static bool isBack(const std::string& service, const ProcessId& former) {
+        const auto end = std::chrono::steady_clock::now() + seconds(2);
+        while (std::chrono::steady_clock::now() < end) {
+            const ServiceState state = serviceState(service);
+            if (state.daemon != former && isServing(state)) {
+                return true;
+            }
+            std::this_thread::sleep_for(milliseconds(5));
+        }
+        return false;
+    }
+};
+
+TEST_F(ControlledServices, ftpStartsMovesAndStops) {
+    storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
+    EXPECT_TRUE(servesFtp(2121));
+    const ProcessId daemon = serviceState("ftpd").daemon;
+    EXPECT_EQ(VLIBServicectlStart("ftpd-pure", 0), 0) << lastErrorSentence();
+    EXPECT_EQ(serviceState("ftpd").daemon, daemon) << "nothing changed";
+    storeAndStart(VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS, 2123);
+    EXPECT_TRUE(servesFtp(2123));
+    EXPECT_FALSE(servesFtp(2121));
+    EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_FALSE(servesFtp(2123));
+}
+
+TEST_F(ControlledServices, aKilledFtpDaemonIsUpAgainWithinTwoSeconds) {
+    storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
+    const ProcessId daemon = serviceState("ftpd").daemon;
+    signalProcess(daemon, SIGKILL);
+    EXPECT_TRUE(isBack("ftpd", daemon));
+    EXPECT_TRUE(servesFtp(2121));
+}
+
+TEST_F(ControlledServices, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
+    addShare("music", "music", ShareGrant::none);
+    record.user_chroot = 0; // the share root's list has to come back as well
+    storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
+    const ProcessId daemon = serviceState("ftpd").daemon;
+    addShare("films", "films", ShareGrant::none);
+    std::strcpy(record.portnum, "2123");
+    ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    {
+        const TakenPort taken(2123);
+        EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
+        EXPECT_EQ(serviceState("ftpd").daemon, daemon);
+        signalProcess(daemon, SIGKILL);
+        EXPECT_TRUE(isBack("ftpd", daemon));
+        const ProcessResult listing =
+            curl({"--list-only", "--user", "alice:alice-secret", "ftp://127.0.0.1:2121//"});
+        EXPECT_EQ(listing.output, "music\r\n");
+    }
+    EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(isServing(serviceState("ftpd")));
+}
+
+TEST_F(ControlledServices, unconfinedUsersHaveTheirShareRootThroughTheSupervisor) {
+    addShare("music", "music", ShareGrant::none);
+    record.user_chroot = 0;
+    storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
+    EXPECT_TRUE(isServing(serviceState("ftpd")));
+    const ProcessResult listing =
+        curl({"--silent", "--list-only", "--user", "alice:alice-secret", "ftp://127.0.0.1:2121//"});
+    EXPECT_NE(listing.output.find("music"), std::string::npos) << listing.output;
+}
+
+class ControlledSftp : public ControlledServices {
+protected:
+    void SetUp() override {
+        ControlledServices::SetUp();
+        if (IsSkipped()) {
+            return;
+        }
+        ASSERT_EQ(VELTSFTPConfigSet(1, 2222), 0) << lastErrorSentence();
+        ASSERT_EQ(
+            runProcess({"ssh-keygen", "-q", "-t", "ed25519", "-N", "", "-f", "/mnt/control-key"}).exitCode,
+            0);
+        fs::create_directories("/mnt/home/alice/.ssh");
+        writeFile("/mnt/home/alice/.ssh/authorized_keys", readFileText("/mnt/control-key.pub"), aliceId);
+        ASSERT_EQ(::chown("/mnt/home/alice/.ssh", aliceId, aliceId), 0);
+        writeFile("/mnt/home/alice/large", std::string(300000, 'x'), aliceId);
+    }
+
+    void TearDown() override {
+        ControlledServices::TearDown();
+        for (const char* file : {"/mnt/control-key", "/mnt/control-key.pub", "/mnt/control-got"}) {
+            fs::remove(file);
+        }
+    }
+
+    /// Fetches the large file, at 800 Kbit/s in three seconds.
+    static ProcessResult fetchSlowly(int atPort) {
+        return runProcess({"sftp", "-F", "/dev/null", "-i", "/mnt/control-key", "-l", "800", "-P",
+                           std::to_string(atPort), "-o", "BatchMode=yes", "-o", "StrictHostKeyChecking=no",
+                           "-o", "UserKnownHostsFile=/dev/null", "-b", "-", "alice@127.0.0.1"},
+                          "get large /mnt/control-got\n", seconds(30));
+    }
+};
+
+TEST_F(ControlledSftp, aTransferOutlivesAPauseAndAMove) {
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    EXPECT_NE(VELTSFTPIsAlive(), 0);
+    ProcessResult transfer;
+    std::thread client([&transfer] { transfer = fetchSlowly(2222); });
+    std::this_thread::sleep_for(seconds(1));
+    EXPECT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
+    EXPECT_EQ(VELTSFTPIsAlive(), 0);
+    EXPECT_FALSE(serviceState("sftp").sessions.empty()) << "the transfer should still run";
+    EXPECT_EQ(VELTSFTPConfigSet(1, 2223), 0) << lastErrorSentence();
+    EXPECT_EQ(VLIBServiceResume("sftp"), 0) << lastErrorSentence();
+    client.join();
+    EXPECT_EQ(transfer.exitCode, 0) << transfer.errors;
+    EXPECT_EQ(readFileText("/mnt/control-got").size(), 300000U);
+    EXPECT_NE(fetchSlowly(2222).exitCode, 0) << "the former port is closed";
+    EXPECT_NE(VELTSFTPIsAlive(), 0);
+}
+
+TEST_F(ControlledSftp, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    const ProcessId daemon = serviceState("sftp").daemon;
+    ASSERT_EQ(VELTSFTPConfigSet(1, 2223), 0) << lastErrorSentence();
+    const TakenPort taken(2223);
+    EXPECT_LT(VLIBServiceStart("sftp", 0), 0);
+    signalProcess(daemon, SIGKILL);
+    EXPECT_TRUE(isBack("sftp", daemon));
+    EXPECT_EQ(fetchSlowly(2222).exitCode, 0);
+}
+
+TEST_F(ControlledSftp, aStopEndsTheTransfer) {
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    ProcessResult transfer;
+    std::thread client([&transfer] { transfer = fetchSlowly(2222); });
+    std::this_thread::sleep_for(seconds(1));
+    EXPECT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
+    EXPECT_FALSE(serviceState("sftp").sessions.empty()) << "the transfer should still run";
+    EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+    client.join();
+    EXPECT_NE(transfer.exitCode, 0);
+    EXPECT_EQ(serviceState("sftp").state, RunState::stopped);
+}
+
+TEST_F(ControlledSftp, afterABootBothServicesStart) {
+    record.service_flags = VELT_FTP_SERVICE_TLS | VELT_FTP_SERVICE_PLAIN;
+    ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    EXPECT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+    EXPECT_TRUE(servesFtp(2121));
+    EXPECT_NE(VELTSFTPIsAlive(), 0);
+    const ProcessId sshd = serviceState("sftp").daemon;
+    signalProcess(sshd, SIGKILL);
+    EXPECT_TRUE(isBack("sftp", sshd));
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,137 @@
+// The SFTP service with real clients.
+#include "platform/sftp.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
+#include "standalone/core/state_root.h"
+#include "tests/system/support/daemon_process.h"
+#include "tests/system/support/ftp_service.h"
+#include "tests/system/support/private_world.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <filesystem>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class SftpService : public testing::Test {
+protected:
+    static constexpr int port = 2222;
+
+    void SetUp() override {
+        if (!whyNoWorld().empty()) {
+            GTEST_SKIP() << whyNoWorld();
+        }
+        setStateRoot(worldRoot);
+        const auto made = runProcess({"ssh-keygen", "-q", "-t", "ed25519", "-N", "", "-f", key_});
+        ASSERT_EQ(made.exitCode, 0) << made.errors;
+        allow("/mnt/home/alice", aliceId);
+        writeFile("/mnt/home/alice/file", "contents", aliceId);
+    }
+    void TearDown() override {
+        daemon_.stop();
+        for (const fs::path& path : {fs::path(key_), fs::path(key_ + ".pub"), fs::path("/mnt/known"),
+                                     fs::path("/mnt/home/alice/.ssh"), fs::path("/mnt/home/alice/file"),
+                                     worldRoot / "etc", worldRoot / "run", worldRoot / "var"}) {
+            std::error_code error;
+            fs::remove_all(path, error);
+        }
+    }
+
+    void allow(const fs::path& home, unsigned id) {
+        fs::create_directories(home / ".ssh");
+        writeFile(home / ".ssh" / "authorized_keys", readFileText(key_ + ".pub"), id);
+        ASSERT_EQ(chown((home / ".ssh").c_str(), id, id), 0);
+    }
+
+    void start(int atPort) {
+        daemon_.stop();
+        ASSERT_EQ(VELTSFTPConfigSet(1, atPort), 0) << lastErrorSentence();
+        const auto plan = planSftpDaemon();
+        ASSERT_TRUE(plan) << lastErrorSentence();
+        EXPECT_EQ(plan->listenPorts, std::vector<int>{atPort});
+        ASSERT_TRUE(daemon_.start(*plan));
+        std::string known;
+        for (const char* kind : {"ed25519", "rsa"}) {
+            known +=
+                "[127.0.0.1]:" + std::to_string(atPort) + ' ' +
+                readFileText(worldRoot / "var/lib/velt/ssh" / ("host_" + std::string(kind) + "_key.pub"));
+        }
+        writeFile("/mnt/known", known);
+    }
+
+    std::vector<std::string> client(const std::string& program, int atPort) const {
+        return {program,
+                "-F",
+                "/dev/null",
+                "-i",
+                key_,
+                "-o",
+                "Port=" + std::to_string(atPort),
+                "-o",
+                "BatchMode=yes",
+                "-o",
+                "StrictHostKeyChecking=yes",
+                "-o",
+                "UserKnownHostsFile=/mnt/known"};
+    }
+    ProcessResult sftp(const std::string& commands, const std::string& user = "alice", int atPort = port) {
+        auto arguments = client("sftp", atPort);
+        arguments.insert(arguments.end(), {"-b", "-", user + "@127.0.0.1"});
+        return runProcess(arguments, commands, std::chrono::seconds(20));
+    }
+
+    const std::string key_ = "/mnt/key";
+    DaemonProcess daemon_;
+};
+
+TEST_F(SftpService, transfersFilesBothWays) {
+    start(port);
+    const auto result = sftp("get file /mnt/got\nput /etc/hostname sent\n");
+    EXPECT_EQ(result.exitCode, 0) << result.errors;
+    EXPECT_EQ(readFileText("/mnt/got"), "contents");
+    EXPECT_EQ(readFileText("/mnt/home/alice/sent"), readFileText("/etc/hostname"));
+    fs::remove("/mnt/got");
+    fs::remove("/mnt/home/alice/sent");
+}
+
+TEST_F(SftpService, givesNoShellAndForwardsNothing) {
+    start(port);
+    auto shell = client("ssh", port);
+    shell.insert(shell.end(), {"alice@127.0.0.1", "id"});
+    const auto refused = runProcess(shell, {}, std::chrono::seconds(20));
+    EXPECT_NE(refused.exitCode, 0);
+    EXPECT_EQ(refused.output.find("uid="), std::string::npos);
+
+    auto forward = client("ssh", port);
+    forward.insert(forward.end(), {"-W", "127.0.0.1:" + std::to_string(port), "alice@127.0.0.1"});
+    const auto tunnel = runProcess(forward, {}, std::chrono::seconds(20));
+    EXPECT_NE(tunnel.exitCode, 0);
+    EXPECT_EQ(tunnel.output.find("SSH-2.0"), std::string::npos) << tunnel.output;
+}
+
+TEST_F(SftpService, refusesRootAndStrangers) {
+    start(port);
+    EXPECT_NE(sftp("pwd\n", "root").exitCode, 0);
+    EXPECT_NE(sftp("pwd\n", "carol").exitCode, 0) << "she has no key here";
+}
+
+TEST_F(SftpService, listensOnTheStoredPortOnly) {
+    start(port);
+    start(2223);
+    EXPECT_EQ(sftp("pwd\n", "alice", 2223).exitCode, 0);
+    EXPECT_FALSE(isListening(port));
+}
+
+TEST_F(SftpService, keepsItsIdentityOverRestarts) {
+    start(port);
+    const std::string first = readFileText("/mnt/known");
+    start(port);
+    EXPECT_EQ(readFileText("/mnt/known"), first);
+    EXPECT_EQ(sftp("pwd\n").exitCode, 0);
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,35 @@
+// A daemon under test, started straight from its plan.
+#ifndef VELT_TESTS_SYSTEM_SUPPORT_DAEMON_PROCESS_H
+#define VELT_TESTS_SYSTEM_SUPPORT_DAEMON_PROCESS_H
+
+#include "standalone/daemon_plan.h"
+
+#include <sys/types.h>
+
+namespace velt::test {
+
+class DaemonProcess {
+public:
+    DaemonProcess() = default;
+    ~DaemonProcess() { stop(); }
+    DaemonProcess(const DaemonProcess&) = delete;
+    DaemonProcess& operator=(const DaemonProcess&) = delete;
+
+    /// Starts the daemon and waits until it listens; false, with the daemon's own output shown, when it does not.
+    bool start(const DaemonPlan& plan);
+
+    /// Ends the daemon and waits for its end.
+    void stop();
+
+    pid_t pid() const { return pid_; }
+
+private:
+    pid_t pid_ = -1;
+};
+
+/// Whether something in this network name space listens on the TCP port.
+bool isListening(int port);
+
+} // namespace velt::test
+
+#endif

@@ -1,0 +1,99 @@
+#include "tests/system/support/ftp_service.h"
+
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <iterator>
+
+namespace velt::test {
+namespace fs = std::filesystem;
+
+void FtpService::SetUp() {
+    if (!whyNoWorld().empty()) {
+        GTEST_SKIP() << whyNoWorld();
+    }
+    setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
+    setStateRoot(worldRoot);
+    ASSERT_EQ(VELTFTPConfGet(&record), 0);
+    std::strcpy(record.portnum, "2121");
+    record.service_flags = VELT_FTP_SERVICE_PLAIN;
+    record.user_chroot = 1;
+    unsigned id = aliceId;
+    for (const char* name : {"alice", "bob", "carol"}) {
+        writeFile(fs::path("/mnt/home") / name / "home-of", name, id++);
+    }
+}
+
+void FtpService::TearDown() {
+    daemon_.stop();
+    for (const char* folder :
+         {"/mnt/root", "/mnt/srv", "/mnt/home/alice", "/mnt/home/bob", "/mnt/home/carol"}) {
+        std::error_code error;
+        for (const auto& entry : fs::directory_iterator(folder, error)) {
+            fs::remove_all(entry, error);
+        }
+    }
+}
+
+void FtpService::letAnonymousIn(const std::string& share) {
+    record.anonymous = 1;
+    record.anonymous_chroot = share.empty() ? 0 : 1;
+    std::snprintf(record.anonymous_chroot_share, sizeof record.anonymous_chroot_share, "%s", share.c_str());
+}
+
+fs::path FtpService::addShare(const std::string& name, const std::string& folder, ShareGrant anonymous,
+                              bool offered) {
+    const fs::path path = fs::path("/mnt/srv") / folder;
+    fs::create_directories(path);
+    EXPECT_EQ(chmod(path.c_str(), 0777), 0);
+    ShareEntry share{name, "", path, offered, {}, {}};
+    share.users["ftp"] = anonymous;
+    shares_.push_back(share);
+    EXPECT_EQ(velt::saveShares(shares_), 0) << lastErrorSentence();
+    return path;
+}
+
+void FtpService::start() {
+    daemon_.stop();
+    ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    const auto plan = planFtpDaemon();
+    ASSERT_TRUE(plan) << lastErrorSentence();
+    ASSERT_TRUE(daemon_.start(*plan));
+}
+
+void FtpService::saveRules(const std::vector<std::string>& rules) {
+    VLIBCSzList* list = VLIBCSzListAlloc(16);
+    for (const auto& rule : rules) {
+        ASSERT_EQ(VLIBCSzListPush(&list, rule.c_str()), 0);
+    }
+    EXPECT_EQ(VELTFTPChrootRuleSave(list), 0) << lastErrorSentence();
+    VLIBCSzListFree(list);
+}
+
+ProcessResult FtpService::curl(std::vector<std::string> arguments) {
+    arguments.insert(arguments.begin(), {"curl", "--silent", "--show-error", "--max-time", "20"});
+    return runProcess(arguments, {}, std::chrono::seconds(30));
+}
+
+void writeFile(const fs::path& path, const std::string& contents, unsigned owner) {
+    std::ofstream(path, std::ios::binary) << contents;
+    EXPECT_EQ(chown(path.c_str(), owner, owner), 0) << path;
+}
+
+std::string readFileText(const fs::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+unsigned modeOf(const fs::path& path) {
+    struct stat facts {};
+    return stat(path.c_str(), &facts) == 0 ? facts.st_mode & 07777U : 0;
+}
+
+} // namespace velt::test
