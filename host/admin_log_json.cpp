@@ -1,0 +1,127 @@
+#include "host/admin_log_json.h"
+
+#include "host/clock.h"
+#include "host/json_text.h"
+
+#include <array>
+#include <charconv>
+#include <cstdio>
+#include <sstream>
+
+namespace velt::host {
+
+namespace {
+
+constexpr int maxLimit = 500;
+
+std::optional<unsigned> hexDigits(std::string_view text) {
+    unsigned value = 0;
+    const auto [stop, error] = std::from_chars(text.data(), text.data() + text.size(), value, 16);
+    return error == std::errc() && stop == text.data() + text.size() ? std::optional(value) : std::nullopt;
+}
+
+/// Nothing when an escape is none, or the text is no UTF-8.
+std::optional<std::string> percentDecoded(const std::string& text) {
+    std::string decoded;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        if (text[i] == '%') {
+            const auto byte = i + 2 < text.size() ? hexDigits(text.substr(i + 1, 2)) : std::nullopt;
+            if (!byte) {
+                return std::nullopt;
+            }
+            decoded += static_cast<char>(*byte);
+            i += 2;
+        } else {
+            decoded += text[i] == '+' ? ' ' : text[i];
+        }
+    }
+    return findInvalidUtf8(decoded) == std::string::npos ? std::optional(decoded) : std::nullopt;
+}
+
+std::optional<std::int64_t> positiveNumber(const std::string& text) {
+    std::int64_t value = 0;
+    const char* const end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, value);
+    return error == std::errc() && stop == end && value > 0 ? std::optional(value) : std::nullopt;
+}
+
+/// "0x11B00012", or the same number in decimal.
+std::optional<std::uint32_t> eventNumber(const std::string& text) {
+    if (text.starts_with("0x") || text.starts_with("0X")) {
+        return hexDigits(std::string_view(text).substr(2));
+    }
+    const auto number = positiveNumber(text);
+    return number && *number <= UINT32_MAX ? std::optional(static_cast<std::uint32_t>(*number))
+                                           : std::nullopt;
+}
+
+/// Takes over one filter; returns what its value must be when it is not that, "" when all is well.
+std::string takeFilter(const std::string& key, const std::string& value, AdminLogQuery& query) {
+    if (key == "since") {
+        query.sinceMilliseconds = parseTimestamp(value);
+        return query.sinceMilliseconds ? "" : "a moment such as 2026-11-21T06:30:00Z";
+    }
+    if (key == "event") {
+        query.event = eventNumber(value);
+        return query.event ? "" : "an event number such as 0x11B00012";
+    }
+    if (key == "actor") {
+        query.actor = value;
+        return "";
+    }
+    if (key == "before") {
+        query.beforeId = positiveNumber(value);
+        return query.beforeId ? "" : "the id of an entry";
+    }
+    if (key == "limit") {
+        const auto limit = positiveNumber(value);
+        query.limit = static_cast<int>(limit && *limit <= maxLimit ? *limit : 0);
+        return query.limit > 0 ? "" : "a number from 1 to " + std::to_string(maxLimit);
+    }
+    return "one of since, event, actor, before and limit";
+}
+
+} // namespace
+
+Json::Value toObject(const AdminLogEntry& entry) {
+    std::array<char, 16> event{};
+    std::snprintf(event.data(), event.size(), "0x%08X", entry.event);
+    Json::Value object(Json::objectValue);
+    object["id"] = Json::Int64{entry.id};
+    object["time"] = timestamp(entry.milliseconds);
+    object["category"] = entry.category;
+    object["level"] = entry.level;
+    object["event"] = event.data();
+    object["text"] = entry.text;
+    object["args"] = Json::Value(Json::arrayValue);
+    for (const std::string& argument : entry.arguments) {
+        object["args"].append(argument);
+    }
+    object["actor"] = entry.actor;
+    object["address"] = entry.address;
+    return object;
+}
+
+std::optional<AdminLogQuery> parseLogQuery(const std::string& query, std::string& error) {
+    AdminLogQuery parsed;
+    std::istringstream parts(query);
+    for (std::string part; std::getline(parts, part, '&');) {
+        const std::size_t equals = part.find('=');
+        const std::string key = part.substr(0, equals);
+        const auto value = percentDecoded(equals == std::string::npos ? "" : part.substr(equals + 1));
+        if (!value) {
+            error = key + ": the value is not encoded as it must be";
+            return std::nullopt;
+        }
+        // An empty filter does not narrow.
+        const std::string expected = value->empty() && !key.empty() ? "" : takeFilter(key, *value, parsed);
+        if (!expected.empty()) {
+            error = key;
+            error += ": expected " + expected;
+            return std::nullopt;
+        }
+    }
+    return parsed;
+}
+
+} // namespace velt::host

@@ -1,0 +1,274 @@
+#include "host/http/listener.h"
+
+#include <arpa/inet.h>
+#include <fcntl.h>
+#include <grp.h>
+#include <netdb.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <system_error>
+#include <utility>
+
+namespace velt::host {
+
+namespace {
+
+constexpr int backlog = 512;
+
+std::string systemError() {
+    return std::generic_category().message(errno);
+}
+
+const sockaddr* generic(const void* address) {
+    return static_cast<const sockaddr*>(address);
+}
+
+bool isLoopback(const addrinfo& info) {
+    if (info.ai_family == AF_INET) {
+        sockaddr_in address{};
+        std::memcpy(&address, info.ai_addr, sizeof address);
+        return (ntohl(address.sin_addr.s_addr) >> 24U) == 127;
+    }
+    sockaddr_in6 address{};
+    std::memcpy(&address, info.ai_addr, std::min(sizeof address, static_cast<std::size_t>(info.ai_addrlen)));
+    return info.ai_family == AF_INET6 && IN6_IS_ADDR_LOOPBACK(&address.sin6_addr) != 0;
+}
+
+/// "[::1]:80" in its host and its port.
+std::pair<std::string, std::string> split(const std::string& address) {
+    const std::size_t colon = address.rfind(':');
+    if (colon == std::string::npos || colon + 1 == address.size()) {
+        throw ListenError("\"" + address + "\" is no address with a port, such as 127.0.0.1:8080.");
+    }
+    std::string host = address.substr(0, colon);
+    if (host.starts_with('[') && host.ends_with(']')) {
+        host = host.substr(1, host.size() - 2);
+    }
+    return {host, address.substr(colon + 1)};
+}
+
+struct SocketName {
+    sockaddr_storage address{};
+    socklen_t size = sizeof(sockaddr_storage);
+};
+
+using NameGetter = int (*)(int, sockaddr*, socklen_t*);
+
+/// The address and port of one end of a socket.
+std::pair<std::string, unsigned short> nameOf(int descriptor, NameGetter get) {
+    SocketName name;
+    void* const raw = &name.address;
+    std::array<char, INET6_ADDRSTRLEN> text{};
+    if (get(descriptor, static_cast<sockaddr*>(raw), &name.size) != 0) {
+        return {"", 0};
+    }
+    if (name.address.ss_family == AF_INET) {
+        sockaddr_in address{};
+        std::memcpy(&address, &name.address, sizeof address);
+        inet_ntop(AF_INET, &address.sin_addr, text.data(), text.size());
+        return {text.data(), ntohs(address.sin_port)};
+    }
+    sockaddr_in6 address{};
+    std::memcpy(&address, &name.address, sizeof address);
+    inet_ntop(AF_INET6, &address.sin6_addr, text.data(), text.size());
+    return {text.data(), ntohs(address.sin6_port)};
+}
+
+int familyOf(int descriptor) {
+    int family = AF_UNSPEC;
+    socklen_t size = sizeof family;
+    getsockopt(descriptor, SOL_SOCKET, SO_DOMAIN, &family, &size);
+    return family;
+}
+
+sockaddr_un unixAddress(const std::filesystem::path& path) {
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    const std::string text = path.string();
+    if (text.size() >= sizeof address.sun_path) {
+        throw ListenError("The path " + text + " is too long for a Unix socket.");
+    }
+    std::memcpy(static_cast<char*>(address.sun_path), text.c_str(), text.size() + 1);
+    return address;
+}
+
+/// Whether a process accepts connections there.
+bool answers(const sockaddr_un& address) {
+    const int descriptor = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    const bool connected = connect(descriptor, generic(&address), sizeof address) == 0 || errno == EAGAIN;
+    close(descriptor);
+    return connected;
+}
+
+void removeStale(const std::filesystem::path& path, const sockaddr_un& address) {
+    struct stat status {};
+    if (lstat(path.c_str(), &status) != 0) {
+        return;
+    }
+    if (!S_ISSOCK(status.st_mode)) {
+        throw ListenError(path.string() + " is there already and is no socket.");
+    }
+    if (answers(address)) {
+        throw ListenError("Another program listens on " + path.string() + " already.");
+    }
+    unlink(path.c_str());
+}
+
+void giveToGroup(const std::filesystem::path& path, const std::string& name) {
+    std::array<char, 16384> buffer{};
+    group record{};
+    group* found = nullptr;
+    if (getgrnam_r(name.c_str(), &record, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
+        return;
+    }
+    if (lchown(path.c_str(), static_cast<uid_t>(-1), found->gr_gid) != 0) {
+        throw ListenError("The group " + name + " cannot be given " + path.string() + ": " + systemError() +
+                          ".");
+    }
+}
+
+void readCredentials(int descriptor, Peer& peer) {
+    ucred credentials{};
+    socklen_t size = sizeof credentials;
+    if (getsockopt(descriptor, SOL_SOCKET, SO_PEERCRED, &credentials, &size) != 0) {
+        return;
+    }
+    peer.uid = credentials.uid;
+    std::array<gid_t, 1024> groups{};
+    size = sizeof groups;
+    if (getsockopt(descriptor, SOL_SOCKET, SO_PEERGROUPS, groups.data(), &size) == 0) {
+        peer.groups.assign(groups.begin(), groups.begin() + size / sizeof(gid_t));
+    }
+    peer.groups.push_back(credentials.gid);
+}
+
+} // namespace
+
+const int Listener::familyUnix = AF_UNIX;
+
+Listener::Listener(int descriptor, int family, std::filesystem::path path)
+    : descriptor_(descriptor), family_(family), path_(std::move(path)) {}
+
+Listener::Listener(Listener&& other) noexcept
+    : descriptor_(std::exchange(other.descriptor_, -1)), family_(other.family_),
+      path_(std::move(other.path_)) {
+    other.path_.clear();
+}
+
+Listener::~Listener() {
+    if (descriptor_ >= 0) {
+        close(descriptor_);
+        if (!path_.empty()) {
+            unlink(path_.c_str());
+        }
+    }
+}
+
+Listener Listener::tcp(const std::string& address, bool allowRemote) {
+    const auto [host, port] = split(address);
+    addrinfo hints{};
+    hints.ai_socktype = SOCK_STREAM;
+    hints.ai_flags = AI_PASSIVE | AI_NUMERICSERV;
+    addrinfo* list = nullptr;
+    if (const int error = getaddrinfo(host.c_str(), port.c_str(), &hints, &list); error != 0) {
+        throw ListenError("\"" + address + "\" is no address to listen on: " + gai_strerror(error) + ".");
+    }
+    const std::unique_ptr<addrinfo, decltype(&freeaddrinfo)> owner(list, freeaddrinfo);
+    if (!allowRemote && !isLoopback(*list)) {
+        throw ListenError(address +
+                          " can be reached from other machines: that needs --allow-remote and a TLS "
+                          "certificate.");
+    }
+    Listener listener(socket(list->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0), list->ai_family,
+                      {});
+    const int on = 1;
+    setsockopt(listener.descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    if (bind(listener.descriptor_, list->ai_addr, list->ai_addrlen) != 0 ||
+        listen(listener.descriptor_, backlog) != 0) {
+        throw ListenError("Cannot listen on " + address + ": " + systemError() + ".");
+    }
+    return listener;
+}
+
+Listener Listener::unixSocket(const std::filesystem::path& path, const std::string& group) {
+    std::error_code error;
+    std::filesystem::create_directories(path.parent_path(), error);
+    const sockaddr_un address = unixAddress(path);
+    removeStale(path, address);
+    Listener listener(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0), AF_UNIX, {});
+    // Nobody may connect between the making of the socket and a later change of its mode.
+    const mode_t former = umask(0117);
+    const int bound = bind(listener.descriptor_, generic(&address), sizeof address);
+    const int reason = errno;
+    umask(former);
+    if (bound != 0) {
+        errno = reason;
+        throw ListenError("Cannot listen on " + path.string() + ": " + systemError() + ".");
+    }
+    listener.path_ = path;
+    giveToGroup(path, group);
+    if (listen(listener.descriptor_, backlog) != 0) {
+        throw ListenError("Cannot listen on " + path.string() + ": " + systemError() + ".");
+    }
+    return listener;
+}
+
+std::vector<Listener> Listener::inherited() {
+    constexpr int firstDescriptor = 3;
+    std::vector<Listener> listeners;
+    const char* const process = std::getenv("LISTEN_PID"); // NOLINT(concurrency-mt-unsafe)
+    const char* const count = std::getenv("LISTEN_FDS");   // NOLINT(concurrency-mt-unsafe)
+    if (process == nullptr || count == nullptr || std::to_string(getpid()) != process) {
+        return listeners;
+    }
+    const long descriptors = std::clamp(std::strtol(count, nullptr, 10), 0L, 64L);
+    for (int descriptor = firstDescriptor; descriptor < firstDescriptor + descriptors; ++descriptor) {
+        fcntl(descriptor, F_SETFD, FD_CLOEXEC);
+        fcntl(descriptor, F_SETFL, fcntl(descriptor, F_GETFL) | O_NONBLOCK);
+        listeners.push_back(Listener(descriptor, familyOf(descriptor), {}));
+    }
+    return listeners;
+}
+
+std::string Listener::name() const {
+    if (isUnixSocket()) {
+        SocketName name;
+        void* const raw = &name.address;
+        getsockname(descriptor_, static_cast<sockaddr*>(raw), &name.size);
+        sockaddr_un address{};
+        std::memcpy(&address, &name.address, std::min(sizeof address, static_cast<std::size_t>(name.size)));
+        return static_cast<const char*>(address.sun_path);
+    }
+    const auto [address, port] = nameOf(descriptor_, getsockname);
+    return (family_ == AF_INET6 ? "[" + address + "]" : address) + ":" + std::to_string(port);
+}
+
+unsigned short Listener::port() const {
+    return isUnixSocket() ? static_cast<unsigned short>(0) : nameOf(descriptor_, getsockname).second;
+}
+
+Peer peerOf(int descriptor, bool isTls) {
+    Peer peer;
+    peer.isTls = isTls;
+    peer.isUnixSocket = familyOf(descriptor) == AF_UNIX;
+    if (peer.isUnixSocket) {
+        peer.address = "local";
+        readCredentials(descriptor, peer);
+    } else {
+        peer.address = nameOf(descriptor, getpeername).first;
+        std::tie(peer.localAddress, peer.localPort) = nameOf(descriptor, getsockname);
+    }
+    return peer;
+}
+
+} // namespace velt::host

@@ -1,0 +1,110 @@
+// Requests and answers as the rest of the host sees them: no sockets, no parser.
+#ifndef VELT_HOST_HTTP_MESSAGE_H
+#define VELT_HOST_HTTP_MESSAGE_H
+
+#include <sys/types.h>
+
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace velt::host {
+
+/// Who is at the other end of a connection, as the kernel says.
+struct Peer {
+    bool isUnixSocket = false;
+    bool isTls = false;
+    std::string address;      ///< "127.0.0.1"; "local" for a Unix socket
+    std::string localAddress; ///< the address that the client connected to
+    unsigned short localPort = 0;
+    uid_t uid = static_cast<uid_t>(-1); ///< of a Unix socket's peer
+    std::vector<gid_t> groups;          ///< of a Unix socket's peer
+};
+
+/// A request, its body complete unless only the head is looked at.
+struct HttpRequest {
+    std::string method;
+    std::string target; ///< path and query, as sent
+    std::string host;
+    std::string origin;        ///< "" when there is none
+    std::string fetchSite;     ///< "" when there is none
+    std::string authorization; ///< "" when there is none
+    std::string body;
+
+    /// The target without query, and the query without "?".
+    std::string path() const { return target.substr(0, target.find('?')); }
+    std::string query() const {
+        const std::size_t mark = target.find('?');
+        return mark == std::string::npos ? "" : target.substr(mark + 1);
+    }
+};
+
+struct HttpResponse {
+    int status = 200;
+    std::string contentType;
+    std::string body;
+    std::vector<std::pair<std::string, std::string>> headers;
+};
+
+enum class Role {
+    viewer,
+    admin,
+};
+
+/// Who sent a request, once access was granted.
+struct Principal {
+    Role role = Role::viewer;
+    std::string actor;
+    std::string address;
+};
+
+/// A request that gets no further than its head.
+struct Refusal {
+    HttpResponse response;
+    bool delayed = false; ///< a failed attempt: the answer waits
+};
+
+/// The reader of a stream of events.
+class EventReader {
+public:
+    EventReader() = default;
+    virtual ~EventReader() = default;
+    EventReader(const EventReader&) = delete;
+    EventReader& operator=(const EventReader&) = delete;
+
+    /// Hands on one event, ready to be sent. Any thread; must not block.
+    virtual void deliver(const std::shared_ptr<const std::string>& event) = 0;
+};
+
+/// What the HTTP server asks of the rest of the host. Called by several threads at once.
+class HttpHandler {
+public:
+    using Done = std::function<void(HttpResponse)>;
+
+    HttpHandler() = default;
+    virtual ~HttpHandler() = default;
+    HttpHandler(const HttpHandler&) = delete;
+    HttpHandler& operator=(const HttpHandler&) = delete;
+
+    /// Looks at a request's head. Grants access by filling `principal`, or refuses the request.
+    virtual std::optional<Refusal> checkAccess(const HttpRequest& head, const Peer& peer,
+                                               Principal& principal) = 0;
+
+    /// Whether the request asks for the stream of events.
+    virtual bool asksForEvents(const HttpRequest& request) const = 0;
+
+    /// Answers a request by calling `done` once, now or later, on any thread. Must not block.
+    virtual void handle(HttpRequest request, const Principal& principal, Done done) = 0;
+
+    /// An answer that the server gives by itself: a malformed or oversized request, an overload.
+    virtual HttpResponse failure(int status, const std::string& detail) = 0;
+
+    virtual void addEventReader(const std::shared_ptr<EventReader>& reader) = 0;
+};
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,187 @@
+#include "host/http/request_reader.h"
+
+#include <boost/beast/http/parser.hpp>
+#include <boost/beast/http/string_body.hpp>
+
+#include <algorithm>
+#include <cstring>
+#include <optional>
+
+namespace velt::host {
+
+namespace {
+
+namespace http = boost::beast::http;
+
+constexpr std::size_t firstBufferSize = std::size_t{8} * 1024;
+
+std::string text(boost::beast::string_view view) {
+    return {view.data(), view.size()};
+}
+
+} // namespace
+
+struct RequestReader::Parser {
+    std::optional<http::request_parser<http::string_body>> http;
+};
+
+RequestReader::RequestReader(std::size_t headLimit, std::size_t bodyLimit)
+    : headLimit_(headLimit), bodyLimit_(bodyLimit), parser_(std::make_unique<Parser>()) {
+    reset();
+}
+
+RequestReader::~RequestReader() = default;
+
+void RequestReader::reset() {
+    auto& parser = parser_->http.emplace();
+    parser.eager(true);
+    parser.body_limit(bodyLimit_);
+    // The reader itself holds the limit, since it hands over heads whole.
+    parser.header_limit(static_cast<std::uint32_t>(headLimit_ + firstBufferSize));
+    headDone_ = false;
+    keepAlive_ = false;
+    expectsContinue_ = false;
+    scanned_ = 0;
+    request_ = {};
+}
+
+std::pair<char*, std::size_t> RequestReader::space() {
+    if (begin_ > 0) {
+        std::memmove(buffer_.data(), buffer_.data() + begin_, end_ - begin_);
+        end_ -= begin_;
+        begin_ = 0;
+    }
+    if (end_ == buffer_.size()) {
+        const std::size_t largest = std::max(headLimit_, firstBufferSize);
+        buffer_.resize(std::min(std::max(buffer_.size() * 2, firstBufferSize), largest));
+    }
+    return {buffer_.data() + end_, buffer_.size() - end_};
+}
+
+void RequestReader::added(std::size_t bytes) {
+    end_ += bytes;
+}
+
+bool RequestReader::hasBegun() const {
+    return headDone_ || begin_ < end_;
+}
+
+RequestReader::Step RequestReader::refuse(int status, const char* detail) {
+    refusal_ = {status, detail};
+    return Step::refused;
+}
+
+RequestReader::Step RequestReader::next() {
+    return headDone_ ? readBody() : readHead();
+}
+
+RequestReader::Step RequestReader::readHead() {
+    // An empty line before a request is let pass, as the protocol asks for.
+    while (scanned_ == 0 && end_ - begin_ >= 2 && buffer_[begin_] == '\r' && buffer_[begin_ + 1] == '\n') {
+        begin_ += 2;
+    }
+    const char* const head = buffer_.data() + begin_;
+    const std::size_t size = end_ - begin_;
+    while (scanned_ < size) {
+        const void* const found = std::memchr(head + scanned_, '\n', size - scanned_);
+        if (found == nullptr) {
+            scanned_ = size;
+            break;
+        }
+        const auto lineEnd = static_cast<std::size_t>(static_cast<const char*>(found) - head);
+        if (lineEnd == 0 || head[lineEnd - 1] != '\r') {
+            return refuse(400, "A line of the head does not end in CR LF.");
+        }
+        if (lineEnd >= 3 && head[lineEnd - 2] == '\n') {
+            return lineEnd < headLimit_ ? checkHead() : refuse(431, "The head of the request is too large.");
+        }
+        // A continued line reads differently to different programs.
+        if (lineEnd + 1 < size && (head[lineEnd + 1] == ' ' || head[lineEnd + 1] == '\t')) {
+            return refuse(400, "A line of the head is continued on the next, which is obsolete.");
+        }
+        if (lineEnd + 1 == size) {
+            // Whether the next line continues this one shows with its first byte.
+            scanned_ = lineEnd;
+            break;
+        }
+        scanned_ = lineEnd + 1;
+    }
+    return size >= headLimit_ ? refuse(431, "The head of the request is too large.") : Step::needMore;
+}
+
+RequestReader::Step RequestReader::checkHead() {
+    auto& parser = *parser_->http;
+    boost::beast::error_code error;
+    begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
+    headDone_ = true;
+    const bool tooLarge = error == http::error::body_limit;
+    if (error && error != http::error::need_more && !tooLarge && !parser.is_header_done()) {
+        return error == http::error::bad_version ? refuse(505, "Only HTTP/1.0 and HTTP/1.1 are spoken.")
+                                                 : refuse(400, "The request is no well-formed HTTP.");
+    }
+    const auto& message = parser.get();
+    const auto hosts = message.count(http::field::host);
+    if (hosts > 1 || (hosts == 0 && message.version() == 11)) {
+        return refuse(400, "The head must hold exactly one Host.");
+    }
+    const auto coding = message.find(http::field::transfer_encoding);
+    if (coding != message.end() && !boost::beast::iequals(coding->value(), "chunked")) {
+        return refuse(501, "The only transfer coding that is understood is chunked.");
+    }
+    fillRequest();
+    if (!request_.target.starts_with('/')) {
+        return refuse(400, "The request's target must begin with \"/\".");
+    }
+    // What is wrong with the body is told later: access is looked at first.
+    if (error && error != http::error::need_more) {
+        refusal_ = {400, "The body is no well-formed HTTP."};
+    }
+    if (tooLarge) {
+        refusal_ = {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
+    }
+    return Step::head;
+}
+
+void RequestReader::fillRequest() {
+    const auto& parser = *parser_->http;
+    const auto& message = parser.get();
+    request_.method = text(message.method_string());
+    request_.target = text(message.target());
+    request_.host = text(message[http::field::host]);
+    request_.origin = text(message[http::field::origin]);
+    request_.fetchSite = text(message["Sec-Fetch-Site"]);
+    // Two of them leave open which one counts, so neither does.
+    const bool one = message.count(http::field::authorization) <= 1;
+    request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
+    keepAlive_ = refusal_.detail.empty() && message.keep_alive();
+    expectsContinue_ =
+        boost::beast::iequals(message[http::field::expect], "100-continue") && !parser.is_done();
+}
+
+RequestReader::Step RequestReader::readBody() {
+    if (!refusal_.detail.empty()) {
+        return Step::refused;
+    }
+    auto& parser = *parser_->http;
+    if (!parser.is_done() && begin_ < end_) {
+        boost::beast::error_code error;
+        begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
+        if (error == http::error::body_limit) {
+            refusal_ = {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
+            return Step::refused;
+        }
+        if (error && error != http::error::need_more) {
+            return refuse(400, "The body is no well-formed HTTP.");
+        }
+        if (!parser.is_done() && end_ - begin_ == std::max(headLimit_, firstBufferSize)) {
+            return refuse(400, "A chunk of the body has too long a head.");
+        }
+    }
+    if (!parser.is_done()) {
+        return Step::needMore;
+    }
+    request_.body = std::move(parser.get().body());
+    return Step::request;
+}
+
+} // namespace velt::host

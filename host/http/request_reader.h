@@ -1,0 +1,81 @@
+// Takes requests out of the bytes of a connection.
+#ifndef VELT_HOST_HTTP_REQUEST_READER_H
+#define VELT_HOST_HTTP_REQUEST_READER_H
+
+#include "host/http/message.h"
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <utility>
+
+namespace velt::host {
+
+/// The framing of one connection's requests, strict where leniency would let two readers disagree about where a
+/// request ends. Not thread-safe.
+class RequestReader {
+public:
+    enum class Step {
+        needMore, ///< read more bytes
+        head,     ///< the head is there: look at it, then go on; comes once for each request
+        request,  ///< the request is complete
+        refused,  ///< no request can be read any more: refusal() says why
+    };
+
+    struct Refused {
+        int status = 400;
+        std::string detail;
+    };
+
+    RequestReader(std::size_t headLimit, std::size_t bodyLimit);
+    ~RequestReader();
+    RequestReader(const RequestReader&) = delete;
+    RequestReader& operator=(const RequestReader&) = delete;
+
+    /// Where the next bytes go, and how many fit: never none after needMore.
+    std::pair<char*, std::size_t> space();
+    void added(std::size_t bytes);
+
+    Step next();
+
+    /// Whether a part of a request is there.
+    bool hasBegun() const;
+
+    /// The head's fields; with its body after `request`.
+    const HttpRequest& request() const { return request_; }
+    HttpRequest takeRequest() { return std::move(request_); }
+    bool keepAlive() const { return keepAlive_; }
+
+    /// Whether the client waits for "100 Continue" before it sends the body.
+    bool expectsContinue() const { return expectsContinue_; }
+    const Refused& refusal() const { return refusal_; }
+
+    /// Begins the next request.
+    void reset();
+
+private:
+    struct Parser;
+
+    Step readHead();
+    Step readBody();
+    Step refuse(int status, const char* detail);
+    Step checkHead();
+    void fillRequest();
+
+    const std::size_t headLimit_;
+    const std::size_t bodyLimit_;
+    std::unique_ptr<Parser> parser_;
+    std::string buffer_;
+    std::size_t begin_ = 0;
+    std::size_t end_ = 0;
+    std::size_t scanned_ = 0; ///< of the head, from begin_
+    bool headDone_ = false;
+    bool keepAlive_ = false;
+    bool expectsContinue_ = false;
+    HttpRequest request_;
+    Refused refusal_;
+};
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,19 @@
+// An answer as it goes over the wire.
+#ifndef VELT_HOST_HTTP_RESPONSE_TEXT_H
+#define VELT_HOST_HTTP_RESPONSE_TEXT_H
+
+#include "host/http/message.h"
+
+#include <string>
+
+namespace velt::host {
+
+/// Status line, headers and body in one text, so that they leave in one write. Without body for HEAD.
+std::string responseText(const HttpResponse& response, bool keepAlive, bool withBody);
+
+/// The head of a stream of events, which ends when the connection does.
+std::string eventStreamHead();
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,208 @@
+#include "host/http/server.h"
+
+#include "host/http/event_stream.h"
+#include "host/http/session.h"
+
+#include <boost/asio/basic_socket_acceptor.hpp>
+#include <boost/asio/executor_work_guard.hpp>
+#include <boost/asio/ssl/context.hpp>
+
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <openssl/ssl.h>
+#include <unistd.h>
+
+#include <functional>
+#include <future>
+#include <thread>
+
+namespace velt::host {
+
+namespace {
+
+namespace asio = boost::asio;
+
+using Acceptor = asio::basic_socket_acceptor<asio::generic::stream_protocol, Executor>;
+using Timer = asio::basic_waitable_timer<std::chrono::steady_clock,
+                                         asio::wait_traits<std::chrono::steady_clock>, Executor>;
+
+constexpr std::chrono::milliseconds acceptPause{50};
+/// So many connections beyond the limit are told why they are not served.
+constexpr std::size_t refusedConnections = 64;
+
+std::unique_ptr<asio::ssl::context> makeTlsContext(const TlsFiles& files) {
+    if (files.certificate.empty()) {
+        return nullptr;
+    }
+    auto context = std::make_unique<asio::ssl::context>(asio::ssl::context::tls_server);
+    SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_2_VERSION);
+    SSL_CTX_set_options(context->native_handle(), SSL_OP_NO_RENEGOTIATION | SSL_OP_NO_COMPRESSION);
+    Error error;
+    context->use_certificate_chain_file(files.certificate.string(), error);
+    if (!error) {
+        context->use_private_key_file(files.key.string(), asio::ssl::context::pem, error);
+    }
+    if (error) {
+        throw ListenError("The TLS certificate " + files.certificate.string() + " with the key " +
+                          files.key.string() + " cannot be used: " + error.message() + ".");
+    }
+    return context;
+}
+
+} // namespace
+
+struct HttpServer::Core {
+    /// One listening socket and its acceptor.
+    struct Door {
+        Door(asio::io_context& context, Listener socket)
+            : listener(std::move(socket)), acceptor(context), peer(context), pause(context) {
+            // The acceptor closes its own descriptor, the listener closes the other.
+            acceptor.assign({listener.isUnixSocket() ? AF_UNIX : AF_INET, 0}, dup(listener.descriptor()));
+        }
+
+        Listener listener;
+        Acceptor acceptor;
+        PlainStream peer;
+        Timer pause;
+    };
+
+    Core(HttpHandler& theHandler, const HttpLimits& theLimits, const TlsFiles& tls)
+        : handler(theHandler), limits(theLimits), tlsContext(makeTlsContext(tls)), sweeper(context) {}
+
+    void accept(Door& door) {
+        door.acceptor.async_accept(door.peer, [this, &door](const Error& error) {
+            if (stopping) {
+                return;
+            }
+            if (!error) {
+                welcome(door);
+                accept(door);
+                return;
+            }
+            // Without descriptors the next attempt would fail at once, too.
+            door.pause.expires_after(acceptPause);
+            door.pause.async_wait([this, &door](const Error&) {
+                if (!stopping) {
+                    accept(door);
+                }
+            });
+        });
+    }
+
+    void welcome(Door& door) {
+        PlainStream socket = std::move(door.peer);
+        door.peer = PlainStream(context);
+        const bool isTls = tlsContext != nullptr && !door.listener.isUnixSocket();
+        Peer peer = peerOf(socket.native_handle(), isTls);
+        if (!peer.isUnixSocket) {
+            const int on = 1;
+            setsockopt(socket.native_handle(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+        }
+        const std::size_t open = connections.count();
+        if (open >= limits.connections) {
+            if (!isTls && open < limits.connections + refusedConnections) {
+                make<PlainStream>(std::move(socket), std::move(peer))->refuse();
+            }
+            return;
+        }
+        if (isTls) {
+            make<TlsStream>(TlsStream(std::move(socket), *tlsContext), std::move(peer))->start();
+        } else {
+            make<PlainStream>(std::move(socket), std::move(peer))->start();
+        }
+    }
+
+    template<class Stream> std::shared_ptr<Session<Stream>> make(Stream stream, Peer peer) {
+        auto session =
+            std::make_shared<Session<Stream>>(context, std::move(stream), std::move(peer), handler, limits);
+        connections.add(session);
+        return session;
+    }
+
+    void sweep() {
+        sweeper.expires_after(limits.sweep);
+        sweeper.async_wait([this](const Error& error) {
+            if (!error) {
+                connections.enforceDeadlines();
+                sweep();
+            }
+        });
+    }
+
+    void closeDoors() {
+        std::promise<void> closed;
+        asio::post(context, [this, &closed] {
+            stopping = true;
+            for (const auto& door : doors) {
+                Error ignored;
+                door->acceptor.close(ignored);
+                door->pause.cancel();
+            }
+            closed.set_value();
+        });
+        closed.get_future().wait();
+    }
+
+    void join() {
+        work.reset();
+        context.stop();
+        for (std::thread& thread : threads) {
+            thread.join();
+        }
+        threads.clear();
+    }
+
+    HttpHandler& handler;
+    const HttpLimits limits;
+    std::unique_ptr<asio::ssl::context> tlsContext;
+    Connections connections;
+    asio::io_context context;
+    asio::executor_work_guard<Executor> work{context.get_executor()};
+    std::vector<std::unique_ptr<Door>> doors;
+    Timer sweeper;
+    std::atomic<bool> stopping{false};
+    std::vector<std::thread> threads;
+};
+
+HttpServer::HttpServer(HttpHandler& handler, const HttpLimits& limits, const TlsFiles& tls)
+    : core_(std::make_unique<Core>(handler, limits, tls)) {}
+
+HttpServer::~HttpServer() {
+    stop(std::chrono::milliseconds(0));
+}
+
+void HttpServer::add(Listener listener) {
+    core_->doors.push_back(std::make_unique<Core::Door>(core_->context, std::move(listener)));
+}
+
+void HttpServer::start(unsigned threads) {
+    core_->sweep();
+    for (const auto& door : core_->doors) {
+        core_->accept(*door);
+    }
+    for (unsigned i = 0; i < threads; ++i) {
+        core_->threads.emplace_back([this] { core_->context.run(); });
+    }
+}
+
+void HttpServer::stop(std::chrono::milliseconds patience) {
+    if (core_->threads.empty()) {
+        return;
+    }
+    core_->closeDoors();
+    const auto end = std::chrono::steady_clock::now() + patience;
+    do {
+        core_->connections.endUnused();
+        if (core_->connections.count() == 0) {
+            break;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    } while (std::chrono::steady_clock::now() < end);
+    core_->join();
+}
+
+std::size_t HttpServer::connections() const {
+    return core_->connections.count();
+}
+
+} // namespace velt::host

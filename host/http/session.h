@@ -1,0 +1,240 @@
+// One connection of the HTTP server, over a plain or a TLS stream.
+#ifndef VELT_HOST_HTTP_SESSION_H
+#define VELT_HOST_HTTP_SESSION_H
+
+#include "host/http/connections.h"
+#include "host/http/message.h"
+#include "host/http/request_reader.h"
+#include "host/http/response_text.h"
+#include "host/http/server.h"
+
+#include <boost/asio/basic_stream_socket.hpp>
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/generic/stream_protocol.hpp>
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/post.hpp>
+#include <boost/asio/ssl/stream.hpp>
+#include <boost/asio/steady_timer.hpp>
+#include <boost/asio/write.hpp>
+
+#include <array>
+#include <memory>
+#include <string>
+#include <type_traits>
+#include <utility>
+
+namespace velt::host {
+
+using Executor = boost::asio::io_context::executor_type;
+using PlainStream = boost::asio::basic_stream_socket<boost::asio::generic::stream_protocol, Executor>;
+using TlsStream = boost::asio::ssl::stream<PlainStream>;
+using Error = boost::system::error_code;
+
+template<class Stream> class EventStream;
+
+/// One operation is in flight at a time, so a session needs no strand; it lives as long as an operation
+/// of it is pending.
+template<class Stream>
+class Session final : public Connection, public std::enable_shared_from_this<Session<Stream>> {
+public:
+    Session(boost::asio::io_context& context, Stream stream, Peer peer, HttpHandler& handler,
+            const HttpLimits& limits)
+        : context_(context), stream_(std::move(stream)), timer_(context), peer_(std::move(peer)),
+          handler_(handler), limits_(limits), reader_(limits.head, limits.body) {}
+
+    /// Serves requests until either side ends the connection.
+    void start() {
+        if constexpr (isTls) {
+            enter(State::draining, limits_.headTime);
+            stream_.async_handshake(Stream::server, [self = this->shared_from_this()](const Error& error) {
+                if (!error) {
+                    self->nextRequest();
+                }
+            });
+        } else {
+            nextRequest();
+        }
+    }
+
+    /// Answers 503 and ends the connection.
+    void refuse() {
+        if constexpr (!isTls) {
+            respond(handler_.failure(503, "Too many connections are open."), false);
+        }
+    }
+
+private:
+    friend class EventStream<Stream>;
+
+    static constexpr bool isTls = std::is_same_v<Stream, TlsStream>;
+
+    int descriptor() override { return socket().native_handle(); }
+
+    PlainStream& socket() {
+        if constexpr (isTls) {
+            return stream_.next_layer();
+        } else {
+            return stream_;
+        }
+    }
+
+    void nextRequest() {
+        reader_.reset();
+        enter(State::idle, limits_.idleTime);
+        step();
+    }
+
+    void read() {
+        const auto [space, size] = reader_.space();
+        stream_.async_read_some(boost::asio::buffer(space, size),
+                                [self = this->shared_from_this()](const Error& error, std::size_t bytes) {
+                                    self->onRead(error, bytes);
+                                });
+    }
+
+    void onRead(const Error& error, std::size_t bytes) {
+        if (error) {
+            if (tooSlow() && state() != State::idle) {
+                respond(handler_.failure(408, "The request took too long to arrive."), false);
+            }
+            return;
+        }
+        reader_.added(bytes);
+        step();
+    }
+
+    void step() {
+        while (true) {
+            if (state() == State::idle && reader_.hasBegun()) {
+                enter(State::head, limits_.headTime);
+            }
+            switch (reader_.next()) {
+            case RequestReader::Step::needMore:
+                read();
+                return;
+            case RequestReader::Step::head:
+                if (!acceptHead()) {
+                    return;
+                }
+                break;
+            case RequestReader::Step::refused:
+                respond(handler_.failure(reader_.refusal().status, reader_.refusal().detail), false);
+                return;
+            case RequestReader::Step::request:
+                serve();
+                return;
+            }
+        }
+    }
+
+    /// False when the reading goes on elsewhere, or not at all.
+    bool acceptHead() {
+        enter(State::body, limits_.bodyTime);
+        if (auto refusal = handler_.checkAccess(reader_.request(), peer_, principal_)) {
+            refuseAccess(std::move(*refusal));
+            return false;
+        }
+        if (!reader_.expectsContinue()) {
+            return true;
+        }
+        static constexpr std::string_view interim = "HTTP/1.1 100 Continue\r\n\r\n";
+        boost::asio::async_write(stream_, boost::asio::buffer(interim),
+                                 [self = this->shared_from_this()](const Error& error, std::size_t) {
+                                     if (!error) {
+                                         self->step();
+                                     }
+                                 });
+        return false;
+    }
+
+    void refuseAccess(Refusal refusal) {
+        enterWithoutDeadline(State::working);
+        if (!refusal.delayed) {
+            respond(refusal.response, false);
+            return;
+        }
+        timer_.expires_after(limits_.refusalDelay);
+        timer_.async_wait([self = this->shared_from_this(), response = std::move(refusal.response)](
+                              const Error&) mutable { self->respond(response, false); });
+    }
+
+    void serve() {
+        enterWithoutDeadline(State::working);
+        HttpRequest request = reader_.takeRequest();
+        if (handler_.asksForEvents(request)) {
+            EventStream<Stream>::start(this->shared_from_this());
+            return;
+        }
+        withBody_ = request.method != "HEAD";
+        handler_.handle(std::move(request), principal_,
+                        [self = this->shared_from_this()](HttpResponse response) {
+                            auto& context = self->context_;
+                            boost::asio::post(context, [self, answer = std::move(response)] {
+                                self->respond(answer, self->reader_.keepAlive());
+                            });
+                        });
+    }
+
+    void respond(const HttpResponse& response, bool keepAlive) {
+        keepAlive = keepAlive && !ending();
+        enter(State::writing, limits_.writeTime);
+        output_ = responseText(response, keepAlive, withBody_);
+        boost::asio::async_write(
+            stream_, boost::asio::buffer(output_),
+            [self = this->shared_from_this(), keepAlive](const Error& error, std::size_t) {
+                if (error) {
+                    return;
+                }
+                if (keepAlive) {
+                    self->withBody_ = true;
+                    self->nextRequest();
+                } else {
+                    self->finish();
+                }
+            });
+    }
+
+    /// Ends the sending side, and throws away for a while what the client still sends: a reset would take the answer
+    /// from it.
+    void finish() {
+        enter(State::draining, limits_.drainTime);
+        if constexpr (isTls) {
+            stream_.async_shutdown([self = this->shared_from_this()](const Error&) { self->drain(); });
+        } else {
+            drain();
+        }
+    }
+
+    void drain() {
+        Error ignored;
+        socket().shutdown(boost::asio::socket_base::shutdown_send, ignored);
+        discard();
+    }
+
+    void discard() {
+        socket().async_read_some(boost::asio::buffer(discarded_),
+                                 [self = this->shared_from_this()](const Error& error, std::size_t) {
+                                     if (!error) {
+                                         self->discard();
+                                     }
+                                 });
+    }
+
+    boost::asio::io_context& context_;
+    Stream stream_;
+    boost::asio::basic_waitable_timer<std::chrono::steady_clock,
+                                      boost::asio::wait_traits<std::chrono::steady_clock>, Executor>
+        timer_;
+    Peer peer_;
+    HttpHandler& handler_;
+    const HttpLimits& limits_;
+    RequestReader reader_;
+    Principal principal_;
+    std::string output_;
+    bool withBody_ = true;
+    std::array<char, 1024> discarded_{};
+};
+
+} // namespace velt::host
+
+#endif

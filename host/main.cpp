@@ -1,0 +1,115 @@
+// veltd: loads the modules over the platform and serves them.
+
+#include "host/app.h"
+#include "host/config.h"
+#include "host/host_log.h"
+#include "host/http/server.h"
+#include "host/json_text.h"
+#include "host/module_table.h"
+#include "host/platform_access.h"
+
+#include <csignal>
+#include <cstdio>
+#include <exception>
+#include <string>
+#include <vector>
+
+namespace {
+
+using velt::host::App;
+using velt::host::AppSettings;
+using velt::host::Config;
+using velt::host::HostLog;
+using velt::host::HttpServer;
+using velt::host::Listener;
+
+constexpr int usageError = 2;
+
+/// The signals that end the host wait for sigwait, in every thread.
+sigset_t blockEndSignals() {
+    sigset_t signals;
+    sigemptyset(&signals);
+    sigaddset(&signals, SIGTERM);
+    sigaddset(&signals, SIGINT);
+    pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+    // A client that leaves early must not end the host.
+    std::signal(SIGPIPE, SIG_IGN); // NOLINT(cert-err33-c)
+    return signals;
+}
+
+/// Adds all listening sockets and returns the line for --print-ready.
+Json::Value listenEverywhere(const Config& config, HttpServer& server, HostLog& log) {
+    std::vector<Listener> listeners = Listener::inherited();
+    if (listeners.empty()) {
+        listeners.push_back(Listener::unixSocket(config.socketPath(), config.adminGroup));
+    }
+    for (const std::string& address : config.listen) {
+        listeners.push_back(Listener::tcp(address, config.allowRemote));
+    }
+    Json::Value ready(Json::objectValue);
+    ready["listen"] = Json::Value(Json::arrayValue);
+    for (Listener& listener : listeners) {
+        log.write("listening on " + listener.name());
+        if (listener.isUnixSocket()) {
+            ready["socket"] = listener.name();
+        } else {
+            ready["listen"].append(listener.name());
+        }
+        server.add(std::move(listener));
+    }
+    return ready;
+}
+
+void serve(const Config& config, const sigset_t& signals, HostLog& log) {
+    std::string error;
+    if (!velt::host::openPlatform(config.stateRoot, error)) {
+        throw velt::host::ConfigError(error);
+    }
+    velt::host::ModuleTable table;
+    for (const auto& module : config.modules) {
+        table.load(module);
+    }
+    AppSettings settings;
+    settings.access = {config.adminGroup, config.hostNames};
+    settings.tokenFile = config.tokenFile();
+    settings.workers = config.workers;
+    App app(settings, table, log);
+    HttpServer server(app, config.limits, config.tls);
+    const Json::Value ready = listenEverywhere(config, server, log);
+    if (!velt::host::startEnabledServices(error)) {
+        log.write("not every enabled service started: " + error);
+    }
+    server.start(config.ioThreads);
+    if (config.printReady) {
+        std::printf("%s\n", velt::host::toJson(ready).c_str());
+        std::fflush(stdout);
+    }
+    int signal = 0;
+    sigwait(&signals, &signal);
+    log.write("stopping");
+    server.stop(config.stopTime);
+    app.stop();
+    log.write("stopped");
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    HostLog log;
+    try {
+        const Config config = velt::host::readConfig(std::vector<std::string>(argv + 1, argv + argc));
+        if (config.help || config.version) {
+            std::printf("%s", config.help ? velt::host::usage() : "veltd " VELT_VERSION "\n");
+            return 0;
+        }
+        const sigset_t signals = blockEndSignals();
+        serve(config, signals, log);
+        return 0;
+    } catch (const velt::host::ConfigError& error) {
+        std::fprintf(stderr, "veltd: %s\n", error.what());
+        return usageError;
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "veltd: %s\n", error.what());
+        return 1;
+    }
+}

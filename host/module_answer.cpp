@@ -1,0 +1,110 @@
+#include "host/module_answer.h"
+
+#include "host/module_log.h"
+#include "host/problem.h"
+
+#include <algorithm>
+#include <array>
+
+namespace velt::host {
+
+namespace {
+
+struct Meaning {
+    int code;
+    int status;
+    const char* title;
+    bool beforeAnyChange; ///< the module refuses with it before it touches anything
+    bool portTaken;
+};
+
+constexpr int badParameter = 1901;
+constexpr Meaning otherFailure{0, 500, "The operation failed", false, false};
+
+constexpr std::array<Meaning, 6> meanings{{
+    {badParameter, 422, "A parameter is not acceptable", true, false},
+    {1902, 500, "The operation failed", false, false},
+    {1903, 409, "The FTP port is taken", true, true},
+    {1904, 409, "The passive port range is taken", true, true},
+    {1905, 409, "The share cannot be reached over FTP", true, false},
+    {1951, 409, "The SFTP port is taken", true, true},
+}};
+
+const Meaning& meaningOf(int code) {
+    const auto* const found = std::find_if(meanings.begin(), meanings.end(),
+                                           [code](const Meaning& each) { return each.code == code; });
+    return found == meanings.end() ? otherFailure : *found;
+}
+
+void append(std::string& detail, const std::string& sentence) {
+    if (sentence.empty()) {
+        return;
+    }
+    detail += (detail.empty() ? "" : " ") + sentence;
+    if (detail.back() != '.' && detail.back() != ']') {
+        detail += '.';
+    }
+}
+
+std::string sentenceOf(const FieldError& error) {
+    return error.field + ": expected " + error.expected + ".";
+}
+
+std::string detailOf(const Outcome& outcome, const Meaning& meaning, const std::vector<FieldError>& errors) {
+    std::string detail;
+    append(detail, reasonIn(outcome.logLines));
+    for (const FieldError& error : errors) {
+        append(detail, sentenceOf(error));
+    }
+    if (meaning.portTaken && !outcome.platform.holder.empty()) {
+        append(detail, "Port " + std::to_string(outcome.platform.port) + " is held by " +
+                           outcome.platform.holder + ".");
+    } else if (meaning.status == 500) {
+        append(detail, outcome.platform.sentence);
+    }
+    if (meaning.beforeAnyChange) {
+        append(detail, "Nothing was changed.");
+    }
+    return detail;
+}
+
+HttpResponse refused(const Outcome& outcome, const std::vector<FieldError>& errors,
+                     const std::string& requestId) {
+    const Meaning& meaning = meaningOf(outcome.code);
+    Json::Value members(Json::objectValue);
+    members["title"] = meaning.title;
+    members["code"] = outcome.code;
+    members["detail"] = detailOf(outcome, meaning, errors);
+    for (const FieldError& error : errors) {
+        Json::Value entry(Json::objectValue);
+        entry["field"] = error.field;
+        entry["expected"] = error.expected;
+        members["errors"].append(entry);
+    }
+    if (meaning.portTaken && !outcome.platform.holder.empty()) {
+        members["holder"] = outcome.platform.holder;
+    }
+    return problemWith(meaning.status, std::move(members), requestId);
+}
+
+} // namespace
+
+HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outcome& outcome,
+                       const OpenApi& openApi, const std::string& requestId) {
+    switch (outcome.kind) {
+    case Outcome::Kind::success:
+        return outcome.data.isNull() ? HttpResponse{204, "", "", {}} : jsonResponse(200, outcome.data);
+    case Outcome::Kind::refused:
+        return refused(outcome,
+                       outcome.code == badParameter ? openApi.explain(row, parameters)
+                                                    : std::vector<FieldError>{},
+                       requestId);
+    default:
+        return problem(500,
+                       "The module did not answer as it must: " + outcome.defect +
+                           ". The host's log has more under this request's id.",
+                       requestId);
+    }
+}
+
+} // namespace velt::host

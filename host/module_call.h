@@ -1,0 +1,36 @@
+// One call of a module's entry function, and what came of it.
+#ifndef VELT_HOST_MODULE_CALL_H
+#define VELT_HOST_MODULE_CALL_H
+
+#include "host/http/message.h"
+#include "host/module_table.h"
+#include "host/platform_access.h"
+
+#include <json/value.h>
+
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+struct Outcome {
+    enum class Kind {
+        success, ///< `data` is the value, null for none
+        refused, ///< `code` is the module's number
+        broken,  ///< the module broke its contract: `defect` says how
+    };
+    Kind kind = Kind::broken;
+    int code = 0;
+    Json::Value data;
+    std::string defect;
+    std::vector<std::string> logLines;
+    PlatformReport platform;
+    double seconds = 0;
+};
+
+/// Calls the row's entry function on this thread. Nothing that the module throws leaves it.
+Outcome callRow(const Row& row, const Json::Value& parameters, const Principal& principal);
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,27 @@
+// Answers that say what went wrong: application/problem+json, RFC 9457.
+#ifndef VELT_HOST_PROBLEM_H
+#define VELT_HOST_PROBLEM_H
+
+#include "host/http/message.h"
+
+#include <json/value.h>
+
+#include <string>
+
+namespace velt::host {
+
+/// The reason phrase of a status: "Not Found".
+const char* reasonPhrase(int status);
+
+/// A problem that the module had no part in; its title is the reason phrase.
+HttpResponse problem(int status, const std::string& detail, const std::string& requestId);
+
+/// A problem with the members given; those of RFC 9457 are filled in when they are missing.
+HttpResponse problemWith(int status, Json::Value members, const std::string& requestId);
+
+/// A JSON value with its status.
+HttpResponse jsonResponse(int status, const Json::Value& value);
+
+} // namespace velt::host
+
+#endif

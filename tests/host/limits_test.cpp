@@ -1,0 +1,184 @@
+// Requests that are too large, too slow or too many.
+
+#include "tests/host/fake_access.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+#include <sys/resource.h>
+
+#include <deque>
+#include <thread>
+
+namespace {
+
+using std::chrono::milliseconds;
+
+const std::string target = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
+
+class HostLimits : public HostTest {
+protected:
+    void SetUp() override {
+        fake::Platform::instance().reset();
+        FakeAccess::instance() = {};
+        settings.workers = 1;
+    }
+};
+
+TEST_F(HostLimits, AHeadMayBeAsLargeAsTheLimit) {
+    start();
+    const std::string small = requestText("GET", "/healthz", admin + "X-Pad: \r\n");
+    const std::size_t room = limits.head - small.size();
+    const auto padded = [this](std::size_t size) {
+        Client client = connect();
+        return client.ask(
+            requestText("GET", "/healthz", admin + "X-Pad: " + std::string(size, 'a') + "\r\n"));
+    };
+    EXPECT_EQ(padded(room).status, 200);
+    EXPECT_EQ(padded(room + 1).status, 431);
+}
+
+TEST_F(HostLimits, AHugeHeadIsRefusedAlthoughItGoesOn) {
+    start();
+    Client client = connect();
+    client.send("GET /healthz HTTP/1.1\r\n");
+    const std::string line = "X-Pad: " + std::string(1000, 'a') + "\r\n";
+    for (int i = 0; i < 200 && client.send(line); ++i) {
+    }
+    EXPECT_EQ(client.receive().status, 431);
+    EXPECT_TRUE(client.ended());
+}
+
+TEST_F(HostLimits, ABodyMayBeAsLargeAsTheLimit) {
+    start();
+    const std::string json = R"({"enable":true})";
+    EXPECT_EQ(post(target + "set", json + std::string(limits.body - json.size(), ' ')).status, 204);
+    const Answer large = post(target + "set", json + std::string(limits.body - json.size() + 1, ' '));
+    EXPECT_EQ(large.status, 413);
+    EXPECT_EQ(large.header("content-type"), "application/problem+json");
+}
+
+TEST_F(HostLimits, AHugeChunkedBodyIsRefused) {
+    limits.body = 10'000;
+    start();
+    Client client = connect();
+    client.send("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +
+                "Transfer-Encoding: chunked\r\n\r\n");
+    const std::string chunk = "3e8\r\n" + std::string(1000, ' ') + "\r\n";
+    for (int i = 0; i < 100 && client.send(chunk); ++i) {
+    }
+    EXPECT_EQ(client.receive().status, 413);
+}
+
+TEST_F(HostLimits, ASlowHeadTimesOut) {
+    limits.headTime = milliseconds(200);
+    start();
+    Client client = connect();
+    client.send("GET /healthz HTTP/1.1\r\nHost: ");
+    const Answer answer = client.receive();
+    EXPECT_EQ(answer.status, 408);
+    EXPECT_EQ(answer.json()["status"], 408);
+    EXPECT_TRUE(client.ended());
+}
+
+TEST_F(HostLimits, ATrickledHeadTimesOut) {
+    limits.headTime = milliseconds(300);
+    start();
+    Client client = connect();
+    const auto begin = std::chrono::steady_clock::now();
+    for (int i = 0; i < 100 && client.send("G"); ++i) {
+        std::this_thread::sleep_for(milliseconds(20));
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(2500));
+    EXPECT_EQ(client.receive().status, 408);
+}
+
+TEST_F(HostLimits, ASlowBodyTimesOut) {
+    limits.bodyTime = milliseconds(200);
+    start();
+    Client client = connect();
+    client.send("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +
+                "Content-Length: 100\r\n\r\n{");
+    EXPECT_EQ(client.receive().status, 408);
+    EXPECT_TRUE(client.ended());
+}
+
+TEST_F(HostLimits, AnIdleConnectionEndsWithoutAnAnswer) {
+    limits.idleTime = milliseconds(200);
+    start();
+    Client fresh = connect();
+    EXPECT_EQ(fresh.receive().status, 0);
+    Client used = connect();
+    EXPECT_EQ(used.ask(requestText("GET", "/healthz", admin)).status, 200);
+    EXPECT_EQ(used.receive().status, 0);
+}
+
+TEST_F(HostLimits, AClientThatTakesNoAnswersIsLeft) {
+    limits.writeTime = milliseconds(300);
+    start();
+    const Client client = connect();
+    const std::string request = requestText("GET", "/openapi.json", admin);
+    // Their answers do not fit into the buffers between the two.
+    for (int i = 0; i < 300; ++i) {
+        if (!client.send(request)) {
+            break;
+        }
+    }
+    for (int i = 0; i < 500 && server->connections() > 0; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+    }
+    EXPECT_EQ(server->connections(), 0U);
+}
+
+TEST_F(HostLimits, ConnectionsBeyondTheLimitAreToldSo) {
+    limits.connections = 5;
+    start();
+    std::deque<Client> open;
+    while (server->connections() > 0) {
+        std::this_thread::sleep_for(milliseconds(5));
+    }
+    for (int i = 0; i < 5; ++i) {
+        open.push_back(connect());
+        EXPECT_EQ(open.back().ask(requestText("GET", "/healthz", admin)).status, 200);
+    }
+    Client more = connect();
+    EXPECT_EQ(more.receive().status, 503);
+    EXPECT_TRUE(more.ended());
+    open.pop_front();
+    Answer answer;
+    for (int i = 0; i < 200 && answer.status != 200; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+        answer = get("/healthz");
+    }
+    EXPECT_EQ(answer.status, 200);
+}
+
+TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
+    rlimit files{};
+    ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &files), 0);
+    ASSERT_GE(files.rlim_max, 2200U) << "the test needs more descriptors";
+    files.rlim_cur = std::max<rlim_t>(files.rlim_cur, 2200);
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &files), 0);
+    limits.connections = 1010;
+    start();
+    std::deque<Client> idle;
+    for (int i = 0; i < 1000; ++i) {
+        idle.push_back(connect());
+        ASSERT_TRUE(idle.back().connected());
+        // Half of them have begun a request.
+        if (i % 2 == 0) {
+            idle.back().send("GET /heal");
+        }
+    }
+    const auto begin = std::chrono::steady_clock::now();
+    Client client = connect();
+    for (int i = 0; i < 100; ++i) {
+        ASSERT_EQ(client.ask(requestText("GET", target + "get", admin)).status, 200);
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+    EXPECT_EQ(idle[0].ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
+    const auto end = std::chrono::steady_clock::now();
+    stop();
+    EXPECT_LT(std::chrono::steady_clock::now() - end, std::chrono::seconds(5));
+}
+
+} // namespace

@@ -1,0 +1,260 @@
+// Requests that reach the module, over the fake platform.
+
+#include "tests/host/fake_access.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+namespace {
+
+const std::string ftp = "/api/VELT.Core.FileServ.FTP/v";
+const std::string security = "/api/VELT.Core.FileServ.FTP.Security/v1/";
+const std::string chroot = "/api/VELT.Core.FileServ.FTP.ChrootUser/v";
+const std::string sftp = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
+
+class HostRows : public HostTest {
+protected:
+    void SetUp() override {
+        platform.reset();
+        FakeAccess::instance() = {};
+        settings.workers = 1; // the fake platform knows one thread
+        start();
+    }
+
+    fake::Platform& platform = fake::Platform::instance();
+    FakeAccess& access = FakeAccess::instance();
+};
+
+TEST_F(HostRows, AReadAnswersItsValue) {
+    platform.timeout = 77;
+    const Answer answer = post(ftp + "3/get");
+    EXPECT_EQ(answer.status, 200);
+    EXPECT_EQ(answer.header("content-type"), "application/json");
+    EXPECT_EQ(answer.json()["timeout"], 77);
+}
+
+TEST_F(HostRows, AReadWithoutParametersMayBeAGet) {
+    for (const std::string& target : {ftp + "1/get", ftp + "2/get", ftp + "3/get", security + "get",
+                                      security + "list_ftp_share", chroot + "2/load", sftp + "get"}) {
+        EXPECT_EQ(get(target).status, 200) << target;
+        EXPECT_EQ(get(target).body, post(target, "{}").body) << target;
+    }
+}
+
+TEST_F(HostRows, AWriteAnswersWithoutContentAndIsDone) {
+    const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(answer.status, 204);
+    EXPECT_EQ(answer.body, "");
+    EXPECT_EQ(answer.header("content-length"), "");
+    EXPECT_EQ(platform.sftp.port, 2222);
+}
+
+TEST_F(HostRows, ARefusedParameterIsExplained) {
+    const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":70000})");
+    EXPECT_EQ(answer.status, 422);
+    EXPECT_EQ(answer.header("content-type"), "application/problem+json");
+    const Json::Value problem = answer.json();
+    EXPECT_EQ(problem["code"], 1901);
+    EXPECT_EQ(problem["status"], 422);
+    EXPECT_EQ(problem["title"], "A parameter is not acceptable");
+    EXPECT_EQ(problem["request_id"], answer.header("x-request-id"));
+    ASSERT_EQ(problem["errors"].size(), 1U);
+    EXPECT_EQ(problem["errors"][0]["field"], "portnum");
+    EXPECT_EQ(problem["errors"][0]["expected"], "an integer from 1 to 65535");
+    EXPECT_EQ(problem["detail"], "Invalid port value of input. portnum: expected an integer from 1 to 65535. "
+                                 "Nothing was changed.");
+}
+
+TEST_F(HostRows, AMissingParameterIsNamed) {
+    const Json::Value problem = post(ftp + "3/set", R"({"enable_ftp":true})").json();
+    ASSERT_EQ(problem["errors"].size(), 1U);
+    EXPECT_EQ(problem["errors"][0]["field"], "enable_ftps");
+    EXPECT_EQ(problem["errors"][0]["expected"], "true or false");
+}
+
+TEST_F(HostRows, EveryWrongFieldIsNamed) {
+    const Json::Value problem =
+        post(ftp + "3/set", R"({"enable_ftp":1,"enable_ftps":true,"timeout":"5","utf8_mode":7})").json();
+    std::map<std::string, std::string> errors;
+    for (const Json::Value& each : problem["errors"]) {
+        errors[each["field"].asString()] = each["expected"].asString();
+    }
+    const std::map<std::string, std::string> expected{
+        {"enable_ftp", "true or false"},
+        {"timeout", "an integer from -2147483648 to 2147483647"},
+        {"utf8_mode", "0, 1 or 2"}};
+    EXPECT_EQ(errors, expected);
+}
+
+TEST_F(HostRows, ARangeWithoutItsPortsIsExplained) {
+    const Json::Value problem =
+        post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true})").json();
+    ASSERT_EQ(problem["errors"].size(), 1U) << problem.toStyledString();
+    EXPECT_EQ(problem["errors"][0]["field"], "custom_port");
+}
+
+TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
+    platform.takenPorts["ssh"] = {2121, 40000};
+    access.holder = "the SFTP service";
+    access.port = 2121;
+    const Answer control = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":2121})");
+    EXPECT_EQ(control.status, 409);
+    EXPECT_EQ(control.json()["code"], 1903);
+    EXPECT_EQ(control.json()["holder"], "the SFTP service");
+    EXPECT_EQ(control.json()["detail"],
+              "Port conflict. Port 2121 is held by the SFTP service. Nothing was changed.");
+    const Answer range = post(
+        ftp + "3/set",
+        R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true,"custom_port":"39999:40001"})");
+    EXPECT_EQ(range.status, 409);
+    EXPECT_EQ(range.json()["code"], 1904);
+    platform.takenPorts["ftp"] = {2222};
+    const Answer other = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(other.status, 409);
+    EXPECT_EQ(other.json()["code"], 1951);
+}
+
+TEST_F(HostRows, AShareOutOfReachIsAConflict) {
+    access.holder = "what an earlier request of the thread found";
+    const Answer answer = post(security + "set", R"({"anonymous_chroot":true,"anonymous_chroot_share":"x"})");
+    EXPECT_EQ(answer.status, 409);
+    EXPECT_EQ(answer.json()["code"], 1905);
+    EXPECT_FALSE(answer.json().isMember("holder"));
+}
+
+TEST_F(HostRows, AFailedOperationTellsThePlatformsSentence) {
+    platform.fail("VELTSFTPConfigGet");
+    access.sentence = "The file sftp.conf cannot be read: Permission denied.";
+    const Answer answer = get(sftp + "get");
+    EXPECT_EQ(answer.status, 500);
+    EXPECT_EQ(answer.json()["code"], 1902);
+    EXPECT_EQ(answer.json()["detail"],
+              "Failed to get SFTP config. The file sftp.conf cannot be read: Permission denied.");
+}
+
+TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {
+    const Answer answer = post(sftp + "set", R"({"enable":"yes"})");
+    const std::string id = "request=" + answer.header("x-request-id") + " ";
+    EXPECT_TRUE(logged(id + "module: sftp:"));
+    EXPECT_TRUE(logged("bool variable 'enable' is missing."));
+    EXPECT_TRUE(logged(R"(Request: {"enable":"yes"})"));
+    EXPECT_TRUE(logged(id + "VELT.Core.FileServ.FTP.SFTP v1 set for admin at 127.0.0.1: 422"));
+}
+
+TEST_F(HostRows, TheActorAndTheAddressReachThePlatform) {
+    get(sftp + "get");
+    EXPECT_EQ(access.actor, "admin");
+    EXPECT_EQ(access.address, "127.0.0.1");
+}
+
+TEST_F(HostRows, AnExceptionIsAnAnswerAndTheProcessLivesOn) {
+    platform.throwFrom("VELTFTPConfGet");
+    const Answer broken = get(ftp + "3/get");
+    EXPECT_EQ(broken.status, 500);
+    EXPECT_FALSE(broken.json().isMember("code"));
+    EXPECT_NE(broken.json()["detail"].asString().find("threw an exception"), std::string::npos);
+    EXPECT_FALSE(broken.json()["request_id"].asString().empty());
+    EXPECT_TRUE(logged("request=" + broken.json()["request_id"].asString() + " defect of the module"));
+    EXPECT_EQ(get(ftp + "3/get").status, 200);
+}
+
+TEST_F(HostRows, AnExceptionOfTheJsonLibraryIsAnAnswer) {
+    EXPECT_EQ(post(chroot + "2/save", R"({"rules":[1]})").status, 500);
+    EXPECT_EQ(post(chroot + "2/save", R"({"rules":[]})").status, 204);
+}
+
+TEST_F(HostRows, UnknownRowsAndPathsAreNotFound) {
+    for (const std::string& target :
+         {ftp + "4/get", ftp + "3/put", std::string("/api/VELT.None/v1/get"), std::string("/"),
+          std::string("/api/"), ftp + "03/get", ftp + "3/get/", std::string("/api/v1/get"),
+          ftp + "99999999999999999999/get", std::string("/apis")}) {
+        EXPECT_EQ(post(target).status, 404) << target;
+    }
+}
+
+TEST_F(HostRows, AWrongMethodIsToldTheRightOnes) {
+    const Answer write = get(sftp + "set");
+    EXPECT_EQ(write.status, 405);
+    EXPECT_EQ(write.header("allow"), "POST");
+    const Answer listing = get(chroot + "1/list");
+    EXPECT_EQ(listing.status, 405);
+    EXPECT_EQ(listing.header("allow"), "POST");
+    const Answer read = ask("PUT", sftp + "get", admin);
+    EXPECT_EQ(read.status, 405);
+    EXPECT_EQ(read.header("allow"), "GET, POST");
+    EXPECT_EQ(post("/healthz").header("allow"), "GET");
+    EXPECT_EQ(ask("DELETE", "/api/tokens", admin).header("allow"), "GET, POST");
+    EXPECT_EQ(ask("GET", "/api/tokens/1", admin).header("allow"), "DELETE");
+    EXPECT_EQ(post("/events").header("allow"), "GET");
+}
+
+TEST_F(HostRows, ABodyThatIsNoJsonObjectIsRefusedWithThePosition) {
+    const std::map<std::string, std::string> wrong{
+        {"{\"enable\": tru}", "line 1, column 12"},
+        {"{\n \"enable\": true,\n \"enable\": false}", "line 3, column 2"},
+        {"[1]", "line 1, column 1: expected a JSON object"},
+        {"  7", "line 1, column 3: expected a JSON object"},
+        {"{} x", "line 1, column 4"},
+        {"{\"a\": \"\xC3\x28\"}", "line 1, column 8: the text is not UTF-8"},
+        {std::string(100, '[') + std::string(100, ']'), "nested"},
+    };
+    for (const auto& [body, position] : wrong) {
+        const Answer answer = post(sftp + "set", body);
+        EXPECT_EQ(answer.status, 400) << body;
+        EXPECT_NE(answer.json()["detail"].asString().find(position), std::string::npos)
+            << body << " " << answer.body;
+    }
+    EXPECT_EQ(platform.count("VELTSFTPConfigSet"), 0);
+}
+
+TEST_F(HostRows, AnEmptyBodyIsNoParameters) {
+    EXPECT_EQ(post(security + "set", "").status, 204);
+    EXPECT_EQ(post(security + "set", "  ").status, 204);
+}
+
+TEST_F(HostRows, TextsPassAsUtf8) {
+    platform.shares["Übung"] = {"", "/", 1};
+    platform.ftpShares = {"Übung"};
+    EXPECT_EQ(get(security + "list_ftp_share").body, R"({"share":["Übung"]})");
+}
+
+TEST_F(HostRows, TheRowsAreListed) {
+    const Json::Value rows = get("/api").json()["rows"];
+    EXPECT_EQ(rows.size(), 16U);
+    int reads = 0;
+    for (const Json::Value& row : rows) {
+        reads += row["read"].asBool() ? 1 : 0;
+    }
+    EXPECT_EQ(reads, 8);
+}
+
+TEST_F(HostRows, StatusComesFromTheModulesAnswers) {
+    platform.services["ftpd"] = 1;
+    platform.sftp.port = 2022;
+    const Json::Value status = get("/api/status").json();
+    EXPECT_EQ(status["services"][0]["name"], "ftp");
+    EXPECT_EQ(status["services"][0]["enabled"], true);
+    EXPECT_EQ(status["services"][0]["port"], 21);
+    EXPECT_EQ(status["services"][1]["enabled"], false);
+    EXPECT_EQ(status["services"][2]["name"], "sftp");
+    EXPECT_EQ(status["services"][2]["port"], 2022);
+    EXPECT_EQ(get("/healthz").json()["status"], "ok");
+}
+
+TEST_F(HostRows, MetricsCountRequestsByRowAndOutcome) {
+    platform.services["ftpd"] = 1;
+    get(ftp + "3/get");
+    post(sftp + "set", "{}");
+    post(sftp + "set", R"({"enable":true})");
+    const std::string text = get("/metrics").body;
+    for (
+        const char* line :
+        {R"(velt_requests_total{api="VELT.Core.FileServ.FTP",method="get",outcome="success",version="3"} 1)",
+         R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="1901",version="1"} 1)",
+         R"(velt_service_up{service="ftp"} 1)", R"(velt_service_up{service="ftps"} 0)",
+         R"(velt_service_up{service="sftp"} 1)", R"(velt_daemon_starts_total{service="sftp"} 1)",
+         "velt_request_duration_seconds_bucket"}) {
+        EXPECT_NE(text.find(line), std::string::npos) << line << "\n" << text;
+    }
+}
+
+} // namespace
