@@ -37,6 +37,8 @@ namespace {
 class OpenPort {
 public:
     explicit OpenPort(int port) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+        const int on = 1; // ended connections of a former listener do not count
+        ::setsockopt(descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
         sockaddr_in address{};
         address.sin_family = AF_INET;
         address.sin_port = htons(static_cast<in_port_t>(port));
