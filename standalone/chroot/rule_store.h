@@ -39,7 +39,8 @@ std::optional<ChrootRule> parseRule(std::string_view line);
 /// it cannot be read or is damaged.
 std::optional<std::vector<ChrootRule>> loadRules();
 
-/// Stores these rules in place of the stored ones; logins from now on follow them. Whoever changes what loadRules()
+/// Stores these rules in place of the stored ones; logins from now on follow them, and find the folders of the shares
+/// where they are now. Whoever changes what loadRules()
 /// returned holds a StateLock from before that call until after this one. Negative on failure, with the last error set and the
 /// stored rules as they were.
 int saveRules(const std::vector<ChrootRule>& rules);
