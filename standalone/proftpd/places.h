@@ -5,10 +5,13 @@
 #include "standalone/proftpd/render.h"
 
 #include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
 
 namespace velt {
+
+class ScratchFolder;
 
 /// Everything of the FTP daemon's that does not outlive a boot: "/run/velt/ftp" below the state root.
 std::filesystem::path ftpRunFolder();
@@ -20,6 +23,7 @@ struct FtpSurroundings {
     std::string certificateFingerprint; ///< "" where FTPS is off
     std::filesystem::path
         anonymousFolder; ///< of the share that confines anonymous users; "": none or out of reach
+    std::shared_ptr<const ScratchFolder> throwAway; ///< keeps a certificate that is for a test only
     std::string mounts;  ///< the list for velt-share-root; "" where it is not needed
 };
 

@@ -1,3 +1,4 @@
+#include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemon_test.h"
@@ -34,6 +35,16 @@ TEST_F(FtpCandidate, isTakenWithAllServicesOn) {
 
 TEST_F(FtpCandidate, leavesNothingOfTheTestBehind) {
     ASSERT_EQ(testFtpCandidate(plainSettings()), 0) << lastErrorSentence();
+    EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
+}
+
+TEST_F(FtpCandidate, isTestedWithAThrowAwayCertificateWhereNothingMayBeStored) {
+    setEffectHook([](Effect, std::string_view) { return EffectDecision{false, 0}; });
+    FtpSettings settings = plainSettings();
+    settings.record.service_flags = VELT_FTP_SERVICE_TLS;
+    EXPECT_EQ(testFtpCandidate(settings), 0) << lastErrorSentence();
+    setEffectHook({});
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/tls"));
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
