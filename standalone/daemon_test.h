@@ -2,13 +2,15 @@
 #ifndef VELT_STANDALONE_DAEMON_TEST_H
 #define VELT_STANDALONE_DAEMON_TEST_H
 
+#include "standalone/core/unique_fd.h"
+
 #include <filesystem>
 #include <string>
 #include <vector>
 
 namespace velt {
 
-/// A folder of its own below the state root, gone with this object.
+/// A folder of its own below the state root, gone with this object. Keys may lie in it: nobody but its owner can enter.
 class ScratchFolder {
 public:
     ScratchFolder();
@@ -22,7 +24,12 @@ public:
 
 private:
     std::filesystem::path path_;
+    UniqueFd lock_; ///< tells sweepScratchFolders that the folder is in use
 };
+
+/// Removes the scratch folders that a process left behind when it was killed; those in use stay. Best effort: what cannot be
+/// removed is left for the next time.
+void sweepScratchFolders();
 
 /// What a daemon said last on its standard error, without time, process and host; "" when it said nothing.
 std::string lastWords(const std::string& errors);

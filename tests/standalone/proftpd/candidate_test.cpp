@@ -3,6 +3,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/daemon_test.h"
 #include "standalone/settings/candidate.h"
+#include "standalone/standalone.h"
 #include "tests/standalone/proftpd/example.h"
 #include "tests/standalone/support/temporary_folder.h"
 
@@ -71,6 +72,17 @@ TEST_F(FtpCandidate, isRefusedBelowARootThatTheConfigurationCannotName) {
     setStateRoot(root_.path() / "100%u");
     EXPECT_LT(testFtpCandidate(plainSettings()), 0);
     EXPECT_NE(lastErrorSentence().find("cannot hold"), std::string::npos) << lastErrorSentence();
+}
+
+TEST_F(FtpCandidate, whatAKilledProcessLeftIsSweptAndWhatIsInUseStays) {
+    root_.write("run/velt/test.Killed/key", "private");
+    root_.write("run/velt/ftp/proftpd.conf", "in use");
+    const ScratchFolder used;
+    ASSERT_TRUE(used);
+    ASSERT_EQ(openState(root_.path()), 0) << lastErrorSentence();
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "run/velt/test.Killed"));
+    EXPECT_TRUE(std::filesystem::exists(used.path()));
+    EXPECT_EQ(root_.read("run/velt/ftp/proftpd.conf"), "in use");
 }
 
 TEST(LastWords, areWhatExplainsTheFailure) {
