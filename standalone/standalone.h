@@ -98,8 +98,9 @@ struct PortConflict {
 PortConflict lastPortConflict();
 
 // The calling thread's last error in a sentence: lastErrorSentence, clearLastError
-// (standalone/core/last_error.h). Listing effects instead of doing them, failing or timing them:
-// setEffectHook (standalone/core/effects.h).
+// (standalone/core/last_error.h). Listing effects instead of doing them, or failing them: setEffectHook; hearing which
+// were done, with what result and in what time: setEffectReport (standalone/core/effects.h). Undoing is not in here: a
+// host that wants it keeps what was before, and sets that again.
 
 } // namespace velt
 
