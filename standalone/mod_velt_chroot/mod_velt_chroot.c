@@ -54,7 +54,11 @@ static int get_account(pool *p, const char *login, struct account *account) {
     /* The next look-up may reuse what `pw` points to. */
     account->uid = pw->pw_uid;
     account->gid = pw->pw_gid;
-    (void) pr_auth_getgroups(p, pstrdup(p, pw->pw_name), &gids, &names);
+    /* Every source tells the primary group at least; without an answer, group rules would be skipped. */
+    if (pr_auth_getgroups(p, pstrdup(p, pw->pw_name), &gids, &names) < 0) {
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": the groups cannot be told: login of '%s' refused", login);
+        return FALSE;
+    }
     account->gids = gids;
     return TRUE;
 }
