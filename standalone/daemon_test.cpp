@@ -77,7 +77,8 @@ std::string lastWords(const std::string& errors) {
     std::string words;
     std::istringstream lines(errors);
     for (std::string line; std::getline(lines, line);) {
-        // ProFTPD: "2026-01-31 12:00:00,123 host proftpd[42] host: fatal: ..."; what explains is the first such line.
+        // ProFTPD: "2026-01-31 12:00:00,123 host proftpd[42] host: fatal: ..."; what explains is the first
+        // such line.
         if (const auto at = line.find(": fatal: "); at != std::string::npos) {
             return line.substr(at + std::strlen(": fatal: "));
         }

@@ -10,7 +10,8 @@
 
 namespace velt {
 
-/// A folder of its own below the state root, gone with this object. Keys may lie in it: nobody but its owner can enter.
+/// A folder of its own below the state root, gone with this object. Keys may lie in it: nobody but its owner
+/// can enter.
 class ScratchFolder {
 public:
     ScratchFolder();
@@ -27,14 +28,15 @@ private:
     UniqueFd lock_; ///< tells sweepScratchFolders that the folder is in use
 };
 
-/// Removes the scratch folders that a process left behind when it was killed; those in use stay. Best effort: what cannot be
-/// removed is left for the next time.
+/// Removes the scratch folders that a process left behind when it was killed; those in use stay. Best effort:
+/// what cannot be removed is left for the next time.
 void sweepScratchFolders();
 
 /// What a daemon said last on its standard error, without time, process and host; "" when it said nothing.
 std::string lastWords(const std::string& errors);
 
-/// Runs the test; negative when the daemon refuses, with its own words in the last error. `daemon` is its name for people.
+/// Runs the test; negative when the daemon refuses, with its own words in the last error. `daemon` is its
+/// name for people.
 int runDaemonTest(const std::string& daemon, const std::vector<std::string>& arguments);
 
 } // namespace velt

@@ -35,9 +35,9 @@ struct Remote {
     std::vector<UserEntry> users;
 };
 
-/// What is known of the accounts, and when it was learned. Files are read under the lock, so that a change of a large one is
-/// read once, whoever asks. A domain may take long to answer or not answer at all: it is asked outside of the lock, by one
-/// thread at a time, and the others go on with what it said before.
+/// What is known of the accounts, and when it was learned. Files are read under the lock, so that a change of
+/// a large one is read once, whoever asks. A domain may take long to answer or not answer at all: it is asked
+/// outside of the lock, by one thread at a time, and the others go on with what it said before.
 class Directory {
 public:
     void setSources(AccountSources sources);

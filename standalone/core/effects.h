@@ -1,5 +1,5 @@
-// Every effect of the platform passes here, under a name, so that it can be listed, timed, refused, or failed by
-// a test. What was done is reported; undoing it is up to whoever listened.
+// Every effect of the platform passes here, under a name, so that it can be listed, timed, refused, or failed
+// by a test. What was done is reported; undoing it is up to whoever listened.
 #ifndef VELT_STANDALONE_CORE_EFFECTS_H
 #define VELT_STANDALONE_CORE_EFFECTS_H
 
@@ -38,9 +38,9 @@ using EffectHook = std::function<EffectDecision(Effect effect, std::string_view 
 /// Sets the calling thread's hook in place of its former one; an empty function removes it.
 void setEffectHook(EffectHook hook);
 
-/// Told of each effect that was done, or tried, with its result (negative: failed; also when it threw) and what it took. One
-/// that lies within another ("host keys" within a start) comes before it. Not told of those that the hook left undone. Must
-/// not throw, nor change the last error.
+/// Told of each effect that was done, or tried, with its result (negative: failed; also when it threw) and
+/// what it took. One that lies within another ("host keys" within a start) comes before it. Not told of those
+/// that the hook left undone. Must not throw, nor change the last error.
 using EffectReport = std::function<void(Effect effect, std::string_view subject, int result,
                                         std::chrono::nanoseconds duration)>;
 

@@ -48,11 +48,11 @@ int storeSftpFile(const SftpSettings& settings) {
     return storeFile("sftp settings", sftpSettingsFile, formatSftpSettings(settings));
 }
 
-// The daemon's test needs what the daemon needs: its program, its account, shares that can be read. Settings that switch a
-// service off, or are changed while it is off, must not fail for the want of these; switching it on tests them all.
+// The daemon's test needs what the daemon needs: its program, its account, shares that can be read. Settings
+// that switch a service off, or are changed while it is off, must not fail for the want of these; switching
+// it on tests them all.
 int testIfOn(const FtpSettings& settings) {
-    const bool on =
-        (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
+    const bool on = (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
     return on ? testFtpCandidate(settings) : 0;
 }
 

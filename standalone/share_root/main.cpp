@@ -1,9 +1,11 @@
 // velt-share-root LIST FOLDER PROGRAM ARGUMENTS...
 //
-// Gives a daemon a mount namespace of its own in which the shares stand side by side below FOLDER, as LIST says, and becomes
-// that daemon. The server's own mount table stays as it is, and everything is gone when the daemon has ended.
+// Gives a daemon a mount namespace of its own in which the shares stand side by side below FOLDER, as LIST
+// says, and becomes that daemon. The server's own mount table stays as it is, and everything is gone when the
+// daemon has ended.
 //
-// LIST has one line per share: "ro" or "rw", the place below FOLDER, and the share's folder, separated by tabs.
+// LIST has one line per share: "ro" or "rw", the place below FOLDER, and the share's folder, separated by
+// tabs.
 #include <fcntl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
@@ -27,7 +29,8 @@ namespace {
 }
 
 void leaveOut(const std::string& what, int error) {
-    std::fprintf(stderr, "velt-share-root: %s: %s; the share is left out\n", what.c_str(), std::strerror(error));
+    std::fprintf(stderr, "velt-share-root: %s: %s; the share is left out\n", what.c_str(),
+                 std::strerror(error));
 }
 
 struct Place {

@@ -56,7 +56,8 @@ int storeShares(const std::vector<ShareEntry>& shares) {
     if (refreshShareMap() == 0) {
         return 0;
     }
-    // Without a map the logins that need one are refused; with the old one they would lead to where a share was.
+    // Without a map the logins that need one are refused; with the old one they would lead to where a share
+    // was.
     std::error_code error;
     std::filesystem::remove(ftpRunFolder() / "shares.map", error);
     return -1;

@@ -73,7 +73,8 @@ std::optional<ServerCertificate> load(const Pair& pair) {
                              sha256(*certificateText + *keyText), nullptr};
 }
 
-// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good here too.
+// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good
+// here too.
 bool isUsable(const Pair& pair) {
     const auto certificateText = readFile(pair.certificate);
     const auto keyText = readFile(pair.key);

@@ -27,7 +27,8 @@ bool handshakes(const std::vector<std::string>& arguments) {
            !contains(result.output, "Cipher is (NONE)");
 }
 
-// What such a client says of a session that the server refuses; a client that does not even ask says something else.
+// What such a client says of a session that the server refuses; a client that does not even ask says
+// something else.
 std::string refusalOf(const std::vector<std::string>& arguments) {
     return tlsClient(arguments).errors;
 }

@@ -1,5 +1,5 @@
-// A name service module with three users and one group. Its records are larger than the first buffer that callers
-// offer, so that they have to grow it.
+// A name service module with three users and one group. Its records are larger than the first buffer that
+// callers offer, so that they have to grow it.
 #include <grp.h>
 #include <nss.h>
 #include <pwd.h>

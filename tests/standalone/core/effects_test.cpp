@@ -73,13 +73,15 @@ TEST_F(Effects, AreReportedAfterTheyWereDone) {
     };
     EXPECT_EQ(perform(Effect::start, "ftpd", slow), 7);
     EXPECT_GE(took, std::chrono::milliseconds(20));
-    EXPECT_EQ(perform(Effect::start, "outer", [] { return perform(Effect::store, "inner", [] { return 0; }) - 1; }),
-              -1);
+    EXPECT_EQ(
+        perform(Effect::start, "outer", [] { return perform(Effect::store, "inner", [] { return 0; }) - 1; }),
+        -1);
     EXPECT_THROW(perform(Effect::stop, "ftpd", []() -> int { throw std::runtime_error("x"); }),
                  std::runtime_error);
     setEffectHook([](Effect, std::string_view) { return EffectDecision{false, 0}; });
     EXPECT_EQ(perform(Effect::store, "undone", [] { return 0; }), 0);
-    EXPECT_EQ(reported, (std::vector<std::string>{"start ftpd 7", "store inner 0", "start outer -1", "stop ftpd -1"}));
+    EXPECT_EQ(reported,
+              (std::vector<std::string>{"start ftpd 7", "store inner 0", "start outer -1", "stop ftpd -1"}));
 }
 
 TEST_F(Effects, HaveAHookForEachThread) {
