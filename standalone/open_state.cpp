@@ -1,5 +1,6 @@
 #include "standalone/core/boundary.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemon_test.h"
 #include "standalone/settings/settings.h"
 #include "standalone/standalone.h"
 
@@ -8,7 +9,9 @@ namespace velt {
 int openState(const std::filesystem::path& root) {
     return atBoundary([&] {
         setStateRoot(root);
-        return writeMissingSettings();
+        const int result = writeMissingSettings();
+        sweepScratchFolders();
+        return result;
     });
 }
 

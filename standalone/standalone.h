@@ -84,8 +84,8 @@ struct LogFilter {
     int limit = 100;                      ///< 1 to 1000
 };
 
-/// The newest entries that the filter lets through, newest first. Nothing, with the last error set, when the log
-/// cannot be read.
+/// The newest entries that the filter lets through, newest first. Nothing, with the last error set, when the
+/// log cannot be read.
 std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter);
 
 /// Who holds a port.
@@ -98,8 +98,9 @@ struct PortConflict {
 PortConflict lastPortConflict();
 
 // The calling thread's last error in a sentence: lastErrorSentence, clearLastError
-// (standalone/core/last_error.h). Listing effects instead of doing them, failing or timing them:
-// setEffectHook (standalone/core/effects.h).
+// (standalone/core/last_error.h). Listing effects instead of doing them, or failing them: setEffectHook;
+// hearing which were done, with what result and in what time: setEffectReport (standalone/core/effects.h).
+// Undoing is not in here: a host that wants it keeps what was before, and sets that again.
 
 } // namespace velt
 

@@ -20,8 +20,8 @@ struct LocalGroup {
     std::vector<std::string> members;
 };
 
-/// The users of a password file's text, in its order. Lines that the system's own reader skips (comments, too few fields,
-/// no number) are skipped here.
+/// The users of a password file's text, in its order. Lines that the system's own reader skips (comments, too
+/// few fields, no number) are skipped here.
 std::vector<UserEntry> parsePasswd(std::string_view text);
 
 /// The same for a group file.

@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_ACCOUNTS_ACCOUNT_SOURCES_H
 #define VELT_STANDALONE_ACCOUNTS_ACCOUNT_SOURCES_H
 
+#include <chrono>
 #include <filesystem>
 
 namespace velt {
@@ -13,6 +14,8 @@ struct AccountSources {
     std::filesystem::path loginDefs = "/etc/login.defs";
     std::filesystem::path nsswitch = "/etc/nsswitch.conf";
     std::filesystem::path moduleFolder; ///< of libnss_*.so.2; empty: where the dynamic linker looks
+    /// How long a listing of the domain and LDAP sources is taken as current; they tell of no changes.
+    std::chrono::seconds remoteLifetime{30};
 };
 
 /// Replaces the sources and forgets what was read from the former ones; for tests. Thread-safe.

@@ -14,8 +14,9 @@
 
 namespace {
 
-// Callers keep the records and release none. One that was handed out is therefore never altered or freed, and the same
-// account in the same state is the same record again: there are never more of them than accounts that were looked up.
+// Callers keep the records and release none. One that was handed out is therefore never altered or freed, and
+// the same account in the same state is the same record again: there are never more of them than accounts
+// that were looked up.
 struct UserRecord {
     std::string name;
     std::string description;

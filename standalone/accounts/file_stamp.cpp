@@ -8,8 +8,8 @@ namespace velt {
 
 namespace {
 
-// A file written twice within one tick of the file system's clock may look the same after both, even its inode when
-// the first file was replaced. A stamp this young is therefore equal to nothing.
+// A file written twice within one tick of the file system's clock may look the same after both, even its
+// inode when the first file was replaced. A stamp this young is therefore equal to nothing.
 constexpr std::int64_t youngNanoseconds = 50'000'000;
 
 bool isSettled(const timespec& changed) {

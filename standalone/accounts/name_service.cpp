@@ -88,8 +88,7 @@ std::unique_ptr<NameService> NameService::load(const std::filesystem::path& fold
 }
 
 NameService::NameService(std::unique_ptr<Functions> functions, int source)
-    : functions_(std::move(functions)), source_(source) {
-}
+    : functions_(std::move(functions)), source_(source) {}
 
 NameService::~NameService() = default;
 

@@ -17,7 +17,8 @@ namespace velt {
 /// One loaded module. A source that does not answer looks like one without accounts. Thread-safe.
 class NameService {
 public:
-    /// The module libnss_NAME.so.2 of `folder` (empty: where the dynamic linker looks); null when there is none.
+    /// The module libnss_NAME.so.2 of `folder` (empty: where the dynamic linker looks); null when there is
+    /// none.
     static std::unique_ptr<NameService> load(const std::filesystem::path& folder, std::string_view name,
                                              int source);
     ~NameService();
@@ -43,7 +44,8 @@ private:
     int source_;
 };
 
-/// Whether a line of nsswitch.conf's text, such as "passwd: files winbind", names the service for the database.
+/// Whether a line of nsswitch.conf's text, such as "passwd: files winbind", names the service for the
+/// database.
 bool nsswitchNames(std::string_view text, std::string_view database, std::string_view service);
 
 } // namespace velt

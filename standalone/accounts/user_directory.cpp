@@ -17,9 +17,6 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-// How long a listing of the domain and LDAP sources is taken as current; they tell of no changes.
-constexpr std::chrono::seconds remoteLifetime{30};
-
 struct ModuleName {
     std::string_view name;
     int source;
@@ -32,8 +29,15 @@ constexpr std::array<ModuleName, 3> moduleNames{{
 
 using Modules = std::vector<std::shared_ptr<const NameService>>;
 
-/// What is known of the accounts, and when it was learned. Everything happens under one lock, so that a change
-/// of a large file is read once, whoever asks.
+/// What the domain and LDAP sources said.
+struct Remote {
+    Modules modules;
+    std::vector<UserEntry> users;
+};
+
+/// What is known of the accounts, and when it was learned. Files are read under the lock, so that a change of
+/// a large one is read once, whoever asks. A domain may take long to answer or not answer at all: it is asked
+/// outside of the lock, by one thread at a time, and the others go on with what it said before.
 class Directory {
 public:
     void setSources(AccountSources sources);
@@ -42,18 +46,19 @@ public:
     Modules modules();
 
 private:
+    void refreshRemote();
     bool remoteIsCurrent() const;
-    void readRemote();
 
+    std::mutex remoteReading_; ///< taken before mutex_ where both are
     std::mutex mutex_;
     AccountSources sources_;
+    unsigned sourcesNumber_ = 0;
     std::shared_ptr<const UserSnapshot> users_;
     std::shared_ptr<const GroupSnapshot> groups_;
     FileStamp passwdStamp_;
     FileStamp loginDefsStamp_;
     FileStamp groupStamp_;
-    Modules modules_;
-    std::vector<UserEntry> remote_;
+    Remote remote_;
     std::optional<Clock::time_point> remoteReadAt_;
 };
 
@@ -65,54 +70,77 @@ Directory& directory() {
 void Directory::setSources(AccountSources sources) {
     const std::lock_guard lock(mutex_);
     sources_ = std::move(sources);
+    ++sourcesNumber_;
     users_.reset();
     groups_.reset();
     remoteReadAt_.reset();
-    modules_.clear();
-    remote_.clear();
+    remote_ = {};
 }
 
 bool Directory::remoteIsCurrent() const {
-    return remoteReadAt_ && Clock::now() - *remoteReadAt_ < remoteLifetime;
+    return remoteReadAt_ && Clock::now() - *remoteReadAt_ < sources_.remoteLifetime;
 }
 
-void Directory::readRemote() {
-    const std::string configuration = readFile(sources_.nsswitch).value_or("");
-    modules_.clear();
-    remote_.clear();
+Remote readRemote(const AccountSources& sources) {
+    const std::string configuration = readFile(sources.nsswitch).value_or("");
+    Remote remote;
     for (const ModuleName& module : moduleNames) {
         // A module that is installed but not in use knows accounts that cannot log in.
         if (!nsswitchNames(configuration, "passwd", module.name)) {
             continue;
         }
         std::shared_ptr<const NameService> service =
-            NameService::load(sources_.moduleFolder, module.name, module.source);
+            NameService::load(sources.moduleFolder, module.name, module.source);
         if (service == nullptr) {
             continue;
         }
         for (UserEntry& user : service->users()) {
-            remote_.push_back(std::move(user));
+            remote.users.push_back(std::move(user));
         }
-        modules_.push_back(std::move(service));
+        remote.modules.push_back(std::move(service));
     }
+    return remote;
+}
+
+void Directory::refreshRemote() {
+    std::unique_lock reading(remoteReading_, std::try_to_lock);
+    if (!reading) {
+        {
+            const std::lock_guard lock(mutex_);
+            if (remoteReadAt_) {
+                return;
+            }
+        }
+        reading.lock();
+    }
+    std::unique_lock lock(mutex_);
+    if (remoteIsCurrent()) {
+        return;
+    }
+    const AccountSources sources = sources_;
+    const unsigned number = sourcesNumber_;
+    lock.unlock();
+    Remote remote = readRemote(sources);
+    lock.lock();
+    if (number != sourcesNumber_) {
+        return;
+    }
+    if (!remote_.users.empty() || !remote.users.empty()) {
+        users_.reset();
+    }
+    remote_ = std::move(remote);
     remoteReadAt_ = Clock::now();
 }
 
 std::shared_ptr<const UserSnapshot> Directory::users() {
+    refreshRemote();
     const std::lock_guard lock(mutex_);
-    const bool remoteIsOld = !remoteIsCurrent();
     const FileStamp passwd = FileStamp::of(sources_.passwd);
     const FileStamp loginDefs = FileStamp::of(sources_.loginDefs);
-    bool remoteChanged = false;
-    if (remoteIsOld) {
-        const bool hadRemote = !remote_.empty();
-        readRemote();
-        remoteChanged = hadRemote || !remote_.empty();
-    }
-    if (users_ != nullptr && !remoteChanged && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
+    if (users_ != nullptr && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
         return users_;
     }
-    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remote_,
+    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remote_.users,
                                 parseLoginDefs(readFile(sources_.loginDefs).value_or("")));
     passwdStamp_ = passwd;
     loginDefsStamp_ = loginDefs;
@@ -130,11 +158,9 @@ std::shared_ptr<const GroupSnapshot> Directory::groups() {
 }
 
 Modules Directory::modules() {
+    refreshRemote();
     const std::lock_guard lock(mutex_);
-    if (!remoteIsCurrent()) {
-        readRemote();
-    }
-    return modules_;
+    return remote_.modules;
 }
 
 char lower(char character) {

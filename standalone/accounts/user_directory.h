@@ -1,7 +1,7 @@
 // The users and groups that this server knows, told apart by where they come from.
 //
-// Listing 100,000 users one look-up at a time takes minutes, so each source is enumerated once per change into a
-// snapshot that nobody alters any more; look-ups and descriptions are served from it.
+// Listing 100,000 users one look-up at a time takes minutes, so each source is enumerated once per change
+// into a snapshot that nobody alters any more; look-ups and descriptions are served from it.
 #ifndef VELT_STANDALONE_ACCOUNTS_USER_DIRECTORY_H
 #define VELT_STANDALONE_ACCOUNTS_USER_DIRECTORY_H
 
@@ -35,10 +35,10 @@ struct GroupEntry {
     int source = sourceLocal;
 };
 
-/// All people who have an account: the local ones from UID_MIN to UID_MAX of login.defs in the order of the password
-/// file, then those of the domain, then those of LDAP, as far as these sources tell. "nobody" and system accounts are
-/// no people. Never null. A domain or LDAP source is asked again after half a minute; a change of the local files shows
-/// at once. Thread-safe, as everything here.
+/// All people who have an account: the local ones from UID_MIN to UID_MAX of login.defs in the order of the
+/// password file, then those of the domain, then those of LDAP, as far as these sources tell. "nobody" and
+/// system accounts are no people. Never null. A domain or LDAP source is asked again after half a minute; a
+/// change of the local files shows at once. Thread-safe, as everything here.
 std::shared_ptr<const std::vector<UserEntry>> allUsers();
 
 /// Any account, system accounts included. A name or number that more than one source knows is the local one.

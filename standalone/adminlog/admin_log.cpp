@@ -1,4 +1,5 @@
-// The administrator log: who changed what, when, and from where. A database that several processes write at once.
+// The administrator log: who changed what, when, and from where. A database that several processes write at
+// once.
 #include "platform/adminlog.h"
 
 #include "standalone/adminlog/catalogue.h"
@@ -34,8 +35,8 @@ Connection& connection() {
     return instance;
 }
 
-/// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held. Null, with
-/// the last error set, when it cannot be opened.
+/// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held.
+/// Null, with the last error set, when it cannot be opened.
 LogDatabase* currentDatabase(Connection& open) {
     if (open.database != nullptr && !open.database->isOwn()) {
         fail(ErrorNumber::log,

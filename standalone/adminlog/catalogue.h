@@ -17,8 +17,8 @@ struct CatalogueEntry {
 /// Every event that the catalogue knows, by number.
 std::span<const CatalogueEntry> catalogue();
 
-/// The event's sentence with the texts in their places. What the texts contain is never looked at, not even when it
-/// looks like a place. An event without a sentence is named by its number, with the texts behind it.
+/// The event's sentence with the texts in their places. What the texts contain is never looked at, not even
+/// when it looks like a place. An event without a sentence is named by its number, with the texts behind it.
 std::string sentenceOf(std::uint32_t event, const std::array<std::string, 4>& texts);
 
 } // namespace velt

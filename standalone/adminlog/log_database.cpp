@@ -91,8 +91,7 @@ struct LogDatabase::Statements {
     Statement query;
 };
 
-LogDatabase::LogDatabase(std::filesystem::path path) : path_(std::move(path)), process_(getpid()) {
-}
+LogDatabase::LogDatabase(std::filesystem::path path) : path_(std::move(path)), process_(getpid()) {}
 
 LogDatabase::~LogDatabase() {
     if (!isOwn()) {
@@ -123,8 +122,8 @@ std::unique_ptr<LogDatabase> LogDatabase::open(const std::filesystem::path& path
 
 int LogDatabase::prepare() {
     sqlite3_busy_timeout(database_, busyMilliseconds);
-    // With the log ahead of the table, a commit that is not forced to the disk survives the end of the process; a
-    // power failure may take the last entries, never the table's form.
+    // With the log ahead of the table, a commit that is not forced to the disk survives the end of the
+    // process; a power failure may take the last entries, never the table's form.
     if (switchToWal(database_) != SQLITE_OK ||
         execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
         return failHere("opened");

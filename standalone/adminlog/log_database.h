@@ -18,7 +18,8 @@ namespace velt {
 /// Not thread-safe; several connections may be in use at once, in several processes, too.
 class LogDatabase {
 public:
-    /// Opens the database, which is made when it is missing. Null, with the last error set, when that is impossible.
+    /// Opens the database, which is made when it is missing. Null, with the last error set, when that is
+    /// impossible.
     static std::unique_ptr<LogDatabase> open(const std::filesystem::path& path);
 
     /// Closes the connection, unless this process has it from its parent: its locks are the parent's.
@@ -26,15 +27,15 @@ public:
     LogDatabase(const LogDatabase&) = delete;
     LogDatabase& operator=(const LogDatabase&) = delete;
 
-    /// Whether this process opened the connection. One that it has from its parent cannot be used, nor can the same
-    /// file be opened again beside it, since SQLite takes the parent's locks for its own.
+    /// Whether this process opened the connection. One that it has from its parent cannot be used, nor can
+    /// the same file be opened again beside it, since SQLite takes the parent's locks for its own.
     bool isOwn() const;
 
     /// Whether this is a connection to the file that stands at `path` now.
     bool leadsTo(const std::filesystem::path& path) const;
 
-    /// Adds the entry, whose id it sets, and removes what `retention` (when given) no longer keeps, together or not
-    /// at all. Negative, with the last error set, on failure.
+    /// Adds the entry, whose id it sets, and removes what `retention` (when given) no longer keeps, together
+    /// or not at all. Negative, with the last error set, on failure.
     int append(LogEntry& entry, const std::optional<LogRetention>& retention);
 
     /// As queryLog.

@@ -10,7 +10,8 @@
 
 namespace velt {
 
-/// Texts handed to it are copied. Parameters and columns are counted as SQLite counts them: from 1 and from 0.
+/// Texts handed to it are copied. Parameters and columns are counted as SQLite counts them: from 1 and from
+/// 0.
 class Statement {
 public:
     Statement() = default;

@@ -4,6 +4,7 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemon_plan.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -111,7 +112,19 @@ int saveRules(const std::vector<ChrootRule>& rules) {
         text += formatRule(rule);
         text += '\n';
     }
-    return perform(Effect::store, "chroot rules", [&] { return replaceFile(rulesFile(), text, 0600); });
+    const bool namesShare =
+        std::ranges::any_of(rules, [](const ChrootRule& rule) { return rule.path != homePath; });
+    const StateLock lock;
+    if (!lock) {
+        return -1;
+    }
+    return perform(Effect::store, "chroot rules", [&] {
+        // The daemon finds a share by its map, which an edit of the shares by hand has left behind.
+        if (namesShare && refreshShareMap() < 0) {
+            return -1;
+        }
+        return replaceFile(rulesFile(), text, 0600);
+    });
 }
 
 int makeRulesFile() {

@@ -13,6 +13,32 @@ EffectHook& threadHook() {
     return hook;
 }
 
+EffectReport& threadReport() {
+    thread_local EffectReport report;
+    return report;
+}
+
+int actAndReport(Effect effect, std::string_view subject, const std::function<int()>& act) {
+    // A copy, since the effect may set another one while it runs.
+    const EffectReport report = threadReport();
+    if (!report)
+        return act();
+    const auto start = std::chrono::steady_clock::now();
+    const auto tell = [&](int result) {
+        report(effect, subject, result, std::chrono::steady_clock::now() - start);
+    };
+    int result = -1;
+    try {
+        result = act();
+    } catch (...) {
+        // Part of it may have been done.
+        tell(-1);
+        throw;
+    }
+    tell(result);
+    return result;
+}
+
 ErrorNumber errorOf(Effect effect) {
     switch (effect) {
     case Effect::store:
@@ -56,11 +82,9 @@ std::string_view effectName(Effect effect) {
 int perform(Effect effect, std::string_view subject, const std::function<int()>& act) {
     // A copy, since the hook may replace itself while it runs.
     const EffectHook hook = threadHook();
-    if (!hook)
-        return act();
-    const EffectDecision decision = hook(effect, subject);
+    const EffectDecision decision = hook ? hook(effect, subject) : EffectDecision{};
     if (decision.doIt)
-        return act();
+        return actAndReport(effect, subject, act);
     if (decision.result < 0)
         fail(errorOf(effect), "The effect \"" + std::string(effectName(effect)) + "\" on " +
                                   std::string(subject) + " was refused.");
@@ -69,6 +93,10 @@ int perform(Effect effect, std::string_view subject, const std::function<int()>&
 
 void setEffectHook(EffectHook hook) {
     threadHook() = std::move(hook);
+}
+
+void setEffectReport(EffectReport report) {
+    threadReport() = std::move(report);
 }
 
 } // namespace velt

@@ -1,8 +1,9 @@
-// Every effect of the platform passes here, under a name, so that it can be listed, timed, refused, or
-// failed by a test.
+// Every effect of the platform passes here, under a name, so that it can be listed, timed, refused, or failed
+// by a test. What was done is reported; undoing it is up to whoever listened.
 #ifndef VELT_STANDALONE_CORE_EFFECTS_H
 #define VELT_STANDALONE_CORE_EFFECTS_H
 
+#include <chrono>
 #include <functional>
 #include <string>
 #include <string_view>
@@ -24,7 +25,7 @@ std::string_view effectName(Effect effect);
 
 /// Does the effect by calling `act` and returns its result (negative: failed, last error set). `subject` says
 /// what it concerns ("ftp settings", "ftpd", "velt.service.action"). The hook of the calling thread, when
-/// there is one, is asked first.
+/// there is one, is asked first, and its report, when there is one, is told after.
 int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
 
 /// What a hook decides about one effect: do it, or leave it undone with this result.
@@ -36,6 +37,15 @@ using EffectHook = std::function<EffectDecision(Effect effect, std::string_view 
 
 /// Sets the calling thread's hook in place of its former one; an empty function removes it.
 void setEffectHook(EffectHook hook);
+
+/// Told of each effect that was done, or tried, with its result (negative: failed; also when it threw) and
+/// what it took. One that lies within another ("host keys" within a start) comes before it. Not told of those
+/// that the hook left undone. Must not throw, nor change the last error.
+using EffectReport = std::function<void(Effect effect, std::string_view subject, int result,
+                                        std::chrono::nanoseconds duration)>;
+
+/// Sets the calling thread's report in place of its former one; an empty function removes it.
+void setEffectReport(EffectReport report);
 
 } // namespace velt
 

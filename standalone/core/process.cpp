@@ -90,8 +90,8 @@ public:
 
     int spawn(pid_t& pid, const std::string& program, const std::vector<std::string>& arguments,
               const std::array<int, 3>& standard) {
-        // In a process whose own standard descriptors are closed, these have their numbers. They were opened in
-        // this order, so that no dup2 overwrites one that is still to come.
+        // In a process whose own standard descriptors are closed, these have their numbers. They were opened
+        // in this order, so that no dup2 overwrites one that is still to come.
         for (int i = 0; i < 3; ++i)
             ::posix_spawn_file_actions_adddup2(&actions_, standard[static_cast<std::size_t>(i)], i);
         ::posix_spawn_file_actions_addclosefrom_np(&actions_, STDERR_FILENO + 1);

@@ -19,48 +19,54 @@ module velt_chroot_module;
 /* Below a file nothing can be a directory. */
 static const char no_root[] = "/dev/null/refused";
 
-/* The DefaultRoot of the configuration. A failed login may be followed by another user's, so it is put back each time. */
-static const char *general_root = NULL;
+/* The DefaultRoot of the configuration. A failed login may be followed by another user's, so it is put back
+ * each time. */
+static const char* general_root = NULL;
 
 struct account {
     uid_t uid;
     gid_t gid;
-    const array_header *gids; /* NULL: no further groups */
+    const array_header* gids; /* NULL: no further groups */
 };
 
-static int belongs_to(unsigned long gid, const struct account *account) {
-    if (gid == (unsigned long) account->gid) {
+static int belongs_to(unsigned long gid, const struct account* account) {
+    if (gid == (unsigned long)account->gid) {
         return TRUE;
     }
     if (account->gids == NULL) {
         return FALSE;
     }
-    for (int i = 0; i < (int) account->gids->nelts; i++) {
-        if (gid == (unsigned long) ((const gid_t *) account->gids->elts)[i]) {
+    for (int i = 0; i < (int)account->gids->nelts; i++) {
+        if (gid == (unsigned long)((const gid_t*)account->gids->elts)[i]) {
             return TRUE;
         }
     }
     return FALSE;
 }
 
-static int get_account(pool *p, const char *login, struct account *account) {
-    array_header *gids = NULL;
-    array_header *names = NULL;
+static int get_account(pool* p, const char* login, struct account* account) {
+    array_header* gids = NULL;
+    array_header* names = NULL;
 
-    const struct passwd *pw = pr_auth_getpwnam(p, login);
+    const struct passwd* pw = pr_auth_getpwnam(p, login);
     if (pw == NULL) {
         return FALSE;
     }
     /* The next look-up may reuse what `pw` points to. */
     account->uid = pw->pw_uid;
     account->gid = pw->pw_gid;
-    (void) pr_auth_getgroups(p, pstrdup(p, pw->pw_name), &gids, &names);
+    /* Every source tells the primary group at least; without an answer, group rules would be skipped. */
+    if (pr_auth_getgroups(p, pstrdup(p, pw->pw_name), &gids, &names) < 0) {
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": the groups cannot be told: login of '%s' refused", login);
+        return FALSE;
+    }
     account->gids = gids;
     return TRUE;
 }
 
-/* Finds the path of the rule that applies: NULL when none does. FALSE when the rules cannot be read to their end. */
-static int find_rule(pool *p, const char *file, const struct account *account, const char **path) {
+/* Finds the path of the rule that applies: NULL when none does. FALSE when the rules cannot be read to their
+ * end. */
+static int find_rule(pool* p, const char* file, const struct account* account, const char** path) {
     struct velt_lines lines;
     struct velt_rule rule;
     int status;
@@ -75,7 +81,7 @@ static int find_rule(pool *p, const char *file, const struct account *account, c
             status = -1;
             break;
         }
-        if (rule.is_user && !have_user_rule && rule.id == (unsigned long) account->uid) {
+        if (rule.is_user && !have_user_rule && rule.id == (unsigned long)account->uid) {
             *path = pstrdup(p, rule.path);
             have_user_rule = TRUE;
         } else if (!rule.is_user && *path == NULL && belongs_to(rule.id, account)) {
@@ -87,16 +93,16 @@ static int find_rule(pool *p, const char *file, const struct account *account, c
 }
 
 /* The folder of the share `name`; NULL when the map does not tell. */
-static const char *share_folder(pool *p, const char *map, const char *name, size_t name_length) {
+static const char* share_folder(pool* p, const char* map, const char* name, size_t name_length) {
     struct velt_lines lines;
-    const char *folder = NULL;
+    const char* folder = NULL;
 
     if (velt_lines_open(&lines, map, VELT_SHARES_HEADER) < 0) {
         return NULL;
     }
     while (folder == NULL && velt_lines_next(&lines) > 0) {
-        const char *tab = strchr(lines.text, '\t');
-        if (tab != NULL && (size_t) (tab - lines.text) == name_length &&
+        const char* tab = strchr(lines.text, '\t');
+        if (tab != NULL && (size_t)(tab - lines.text) == name_length &&
             memcmp(lines.text, name, name_length) == 0) {
             folder = pstrdup(p, tab + 1);
         }
@@ -105,7 +111,7 @@ static const char *share_folder(pool *p, const char *map, const char *name, size
     return folder;
 }
 
-static int is_below(const char *folder, const char *path) {
+static int is_below(const char* folder, const char* path) {
     size_t length = strlen(folder);
 
     if (strcmp(folder, "/") == 0) {
@@ -114,9 +120,10 @@ static int is_below(const char *folder, const char *path) {
     return strncmp(folder, path, length) == 0 && (path[length] == '\0' || path[length] == '/');
 }
 
-/* The root directory for a rule's path; NULL when there is none. Whoever may write in the share could put a symbolic link
- * in the place of a folder, so the folder must still lie in the share when all links are followed. */
-static const char *root_of_rule(pool *p, const char *map, const char *rule_path) {
+/* The root directory for a rule's path; NULL when there is none. Whoever may write in the share could put a
+ * symbolic link in the place of a folder, so the folder must still lie in the share when all links are
+ * followed. */
+static const char* root_of_rule(pool* p, const char* map, const char* rule_path) {
     char share_real[PATH_MAX];
     char real[PATH_MAX];
     struct stat st;
@@ -124,13 +131,13 @@ static const char *root_of_rule(pool *p, const char *map, const char *rule_path)
     if (strcmp(rule_path, "/home") == 0) {
         return "~";
     }
-    const char *name = rule_path + 1;
+    const char* name = rule_path + 1;
     size_t name_length = strcspn(name, "/");
-    const char *folder = share_folder(p, map, name, name_length);
+    const char* folder = share_folder(p, map, name, name_length);
     if (folder == NULL || realpath(folder, share_real) == NULL) {
         return NULL;
     }
-    const char *whole = pstrcat(p, share_real, name + name_length, NULL);
+    const char* whole = pstrcat(p, share_real, name + name_length, NULL);
     if (realpath(whole, real) == NULL || !is_below(share_real, real) || stat(real, &st) < 0 ||
         !S_ISDIR(st.st_mode)) {
         return NULL;
@@ -142,9 +149,9 @@ static const char *root_of_rule(pool *p, const char *map, const char *rule_path)
     return pstrdup(p, real);
 }
 
-static const char *root_of_login(pool *p, const config_rec *places, const char *login) {
-    const char *rule_path = NULL;
-    const char *root = NULL;
+static const char* root_of_login(pool* p, const config_rec* places, const char* login) {
+    const char* rule_path = NULL;
+    const char* root = NULL;
 
     struct account account;
     if (!get_account(p, login, &account)) {
@@ -174,41 +181,41 @@ static const char *root_of_login(pool *p, const config_rec *places, const char *
     return root;
 }
 
-MODRET velt_pre_pass(cmd_rec *cmd) {
-    const char *login = pr_table_get(session.notes, "mod_auth.orig-user", NULL);
+MODRET velt_pre_pass(cmd_rec* cmd) {
+    const char* login = pr_table_get(session.notes, "mod_auth.orig-user", NULL);
     if (login == NULL || pr_auth_get_anon_config(cmd->tmp_pool, &login, NULL, NULL) != NULL) {
         return PR_DECLINED(cmd);
     }
 
-    const config_rec *places = find_config(main_server->conf, CONF_PARAM, "VeltChrootRules", FALSE);
-    const char *root = no_root;
+    const config_rec* places = find_config(main_server->conf, CONF_PARAM, "VeltChrootRules", FALSE);
+    const char* root = no_root;
     if (places != NULL && login != NULL) {
         root = root_of_login(cmd->tmp_pool, places, login);
     }
 
-    (void) remove_config(main_server->conf, "DefaultRoot", FALSE);
+    (void)remove_config(main_server->conf, "DefaultRoot", FALSE);
     if (root != NULL) {
-        config_rec *c = add_config_param_set(&main_server->conf, "DefaultRoot", 1, NULL);
+        config_rec* c = add_config_param_set(&main_server->conf, "DefaultRoot", 1, NULL);
         c->argv[0] = pstrdup(c->pool, root);
     }
     return PR_DECLINED(cmd);
 }
 
 /* usage: VeltChrootRules rules-file share-map */
-MODRET set_velt_chroot_rules(cmd_rec *cmd) {
+MODRET set_velt_chroot_rules(cmd_rec* cmd) {
     CHECK_ARGS(cmd, 2);
     CHECK_CONF(cmd, CONF_ROOT);
     for (int i = 1; i <= 2; i++) {
-        if (*(const char *) cmd->argv[i] != '/') {
+        if (*(const char*)cmd->argv[i] != '/') {
             CONF_ERROR(cmd, "needs two absolute paths");
         }
     }
-    (void) add_config_param_str(cmd->argv[0], 2, cmd->argv[1], cmd->argv[2]);
+    (void)add_config_param_str(cmd->argv[0], 2, cmd->argv[1], cmd->argv[2]);
     return PR_HANDLED(cmd);
 }
 
 static int velt_sess_init(void) {
-    const config_rec *c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
     if (c != NULL) {
         general_root = pstrdup(session.pool, c->argv[0]);
     }
@@ -226,6 +233,6 @@ static cmdtable velt_cmdtab[] = {
 };
 
 module velt_chroot_module = {
-    NULL,           NULL, 0x20, "velt_chroot",  velt_conftab,   velt_cmdtab, NULL,
-    NULL,           velt_sess_init, MODULE_VERSION, NULL, 0,
+    NULL, NULL, 0x20,           "velt_chroot",  velt_conftab, velt_cmdtab,
+    NULL, NULL, velt_sess_init, MODULE_VERSION, NULL,         0,
 };

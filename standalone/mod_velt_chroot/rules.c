@@ -16,7 +16,7 @@ static int is_ours_alone(int fd) {
     return (st.st_uid == 0 || st.st_uid == getuid()) && (st.st_mode & (S_IWGRP | S_IWOTH)) == 0;
 }
 
-int velt_lines_open(struct velt_lines *lines, const char *path, const char *header) {
+int velt_lines_open(struct velt_lines* lines, const char* path, const char* header) {
     int fd = open(path, O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK);
 
     if (fd < 0) {
@@ -24,7 +24,7 @@ int velt_lines_open(struct velt_lines *lines, const char *path, const char *head
     }
     lines->file = is_ours_alone(fd) ? fdopen(fd, "r") : NULL;
     if (lines->file == NULL) {
-        (void) close(fd);
+        (void)close(fd);
         return -1;
     }
     if (velt_lines_next(lines) <= 0 || strcmp(lines->text, header) != 0) {
@@ -34,7 +34,7 @@ int velt_lines_open(struct velt_lines *lines, const char *path, const char *head
     return 0;
 }
 
-int velt_lines_next(struct velt_lines *lines) {
+int velt_lines_next(struct velt_lines* lines) {
     size_t length = 0;
     int c;
 
@@ -42,7 +42,7 @@ int velt_lines_next(struct velt_lines *lines) {
         if (c == '\0' || length + 1 >= sizeof(lines->text)) {
             return -1;
         }
-        lines->text[length++] = (char) c;
+        lines->text[length++] = (char)c;
     }
     lines->text[length] = '\0';
     if (c == '\n') {
@@ -51,18 +51,18 @@ int velt_lines_next(struct velt_lines *lines) {
     return length == 0 && !ferror(lines->file) ? 0 : -1;
 }
 
-void velt_lines_close(struct velt_lines *lines) {
-    (void) fclose(lines->file);
+void velt_lines_close(struct velt_lines* lines) {
+    (void)fclose(lines->file);
     lines->file = NULL;
 }
 
 /* Each component must say something, and none may lead elsewhere. */
-static int is_plain_path(const char *path) {
+static int is_plain_path(const char* path) {
     if (*path != '/') {
         return 0;
     }
     while (*path == '/') {
-        const char *component = path + 1;
+        const char* component = path + 1;
         size_t length = strcspn(component, "/");
 
         if (length == 0 || (length == 1 && component[0] == '.') ||
@@ -74,8 +74,8 @@ static int is_plain_path(const char *path) {
     return 1;
 }
 
-int velt_rule_parse(const char *line, struct velt_rule *rule) {
-    char *end;
+int velt_rule_parse(const char* line, struct velt_rule* rule) {
+    char* end;
 
     if ((line[0] != 'u' && line[0] != 'g') || line[1] != ':' || line[2] < '0' || line[2] > '9') {
         return -1;

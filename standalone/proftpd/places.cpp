@@ -91,6 +91,7 @@ int surveyCertificate(FtpSurroundings& found) {
     found.places.certificateKey = certificate->key;
     found.places.certificateIsRsa = certificate->isRsa;
     found.certificateFingerprint = certificate->fingerprint;
+    found.throwAway = certificate->throwAway;
     return 0;
 }
 

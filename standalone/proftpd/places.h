@@ -5,26 +5,31 @@
 #include "standalone/proftpd/render.h"
 
 #include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
 
 namespace velt {
 
+class ScratchFolder;
+
 /// Everything of the FTP daemon's that does not outlive a boot: "/run/velt/ftp" below the state root.
 std::filesystem::path ftpRunFolder();
 
-/// What goes into the configuration beside the settings, found out anew: places, certificate (made when it is missing and
-/// needed), the rights of this process, what anonymous users may do.
+/// What goes into the configuration beside the settings, found out anew: places, certificate (made when it is
+/// missing and needed), the rights of this process, what anonymous users may do.
 struct FtpSurroundings {
     ProftpdPlaces places;
     std::string certificateFingerprint; ///< "" where FTPS is off
     std::filesystem::path
         anonymousFolder; ///< of the share that confines anonymous users; "": none or out of reach
-    std::string mounts;  ///< the list for velt-share-root; "" where it is not needed
+    std::shared_ptr<const ScratchFolder> throwAway; ///< keeps a certificate that is for a test only
+    std::string mounts; ///< the list for velt-share-root; "" where it is not needed
 };
 
-/// Nothing, with the last error set, when the surroundings do not allow these settings: no account "ftp" for anonymous
-/// users, no usable certificate, a damaged share store, a state root whose name cannot stand in the configuration.
+/// Nothing, with the last error set, when the surroundings do not allow these settings: no account "ftp" for
+/// anonymous users, no usable certificate, a damaged share store, a state root whose name cannot stand in the
+/// configuration.
 std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings);
 
 } // namespace velt

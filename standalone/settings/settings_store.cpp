@@ -48,6 +48,18 @@ int storeSftpFile(const SftpSettings& settings) {
     return storeFile("sftp settings", sftpSettingsFile, formatSftpSettings(settings));
 }
 
+// The daemon's test needs what the daemon needs: its program, its account, shares that can be read. Settings
+// that switch a service off, or are changed while it is off, must not fail for the want of these; switching
+// it on tests them all.
+int testIfOn(const FtpSettings& settings) {
+    const bool on = (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
+    return on ? testFtpCandidate(settings) : 0;
+}
+
+int testIfOn(const SftpSettings& settings) {
+    return settings.enabled ? testSftpCandidate(settings) : 0;
+}
+
 bool isMissing(std::string_view name) {
     return ::access(statePath(name).c_str(), F_OK) != 0;
 }
@@ -91,7 +103,7 @@ int changeFtpSettings(const std::function<void(FtpSettings&)>& change) {
     if (!settings)
         return -1;
     change(*settings);
-    if (checkFtpSettings(*settings) < 0 || testFtpCandidate(*settings) < 0)
+    if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
         return -1;
     return storeFtpFile(*settings);
 }
@@ -104,7 +116,7 @@ int changeSftpSettings(const std::function<void(SftpSettings&)>& change) {
     if (!settings)
         return -1;
     change(*settings);
-    if (checkSftpSettings(*settings) < 0 || testSftpCandidate(*settings) < 0)
+    if (checkSftpSettings(*settings) < 0 || testIfOn(*settings) < 0)
         return -1;
     return storeSftpFile(*settings);
 }
@@ -117,7 +129,7 @@ int changeExternalAddress(const std::string& address) {
     if (!settings)
         return -1;
     settings->externalAddress = address;
-    if (checkFtpSettings(*settings) < 0 || testFtpCandidate(*settings) < 0)
+    if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
         return -1;
     return perform(Effect::store, "external address", [&] {
         return writeKeyValue(statePath(systemInformationFile), externalAddressKey, address);

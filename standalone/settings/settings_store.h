@@ -14,8 +14,8 @@ namespace velt {
 std::optional<FtpSettings> loadFtpFile();
 
 /// Reads the settings, lets `change` change them, and stores them after the checks here and the daemon's own
-/// test have passed, all under the StateLock. Negative on failure, with the last error set; nothing is stored
-/// then.
+/// test have passed, all under the StateLock. Settings of a service that is off are not put to the daemon: it
+/// may be what is broken. Negative on failure, with the last error set; nothing is stored then.
 int changeFtpSettings(const std::function<void(FtpSettings&)>& change);
 int changeSftpSettings(const std::function<void(SftpSettings&)>& change);
 

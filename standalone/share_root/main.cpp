@@ -1,9 +1,11 @@
 // velt-share-root LIST FOLDER PROGRAM ARGUMENTS...
 //
-// Gives a daemon a mount namespace of its own in which the shares stand side by side below FOLDER, as LIST says, and becomes
-// that daemon. The server's own mount table stays as it is, and everything is gone when the daemon has ended.
+// Gives a daemon a mount namespace of its own in which the shares stand side by side below FOLDER, as LIST
+// says, and becomes that daemon. The server's own mount table stays as it is, and everything is gone when the
+// daemon has ended.
 //
-// LIST has one line per share: "ro" or "rw", the place below FOLDER, and the share's folder, separated by tabs.
+// LIST has one line per share: "ro" or "rw", the place below FOLDER, and the share's folder, separated by
+// tabs.
 #include <fcntl.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
@@ -26,11 +28,20 @@ namespace {
     std::exit(EXIT_FAILURE);
 }
 
+void leaveOut(const std::string& what, int error) {
+    std::fprintf(stderr, "velt-share-root: %s: %s; the share is left out\n", what.c_str(),
+                 std::strerror(error));
+}
+
 struct Place {
     bool readOnly = false;
     std::string name;
     std::string folder;
 };
+
+bool leadsUp(const std::string& path) {
+    return ("/" + path + "/").find("/../") != std::string::npos;
+}
 
 Place parsePlace(const std::string& line) {
     const auto first = line.find('\t');
@@ -41,36 +52,49 @@ Place parsePlace(const std::string& line) {
     }
     Place place{line.substr(0, first) == "ro", line.substr(first + 1, second - first - 1),
                 line.substr(second + 1)};
-    if (place.name.find("..") == 0 || place.name.find("/..") != std::string::npos) {
+    if (leadsUp(place.name)) {
         errno = EINVAL;
         giveUp("the list of shares");
     }
     return place;
 }
 
-// A share whose folder is gone is left out, so that the others can still be reached.
+// Adds to what the server's own mounts are restricted by already; a plain remount would lift that.
+bool restrict(const std::string& target, bool readOnly) {
+    mount_attr attributes{};
+    attributes.attr_set = MOUNT_ATTR_NOSUID | MOUNT_ATTR_NODEV;
+    if (readOnly) {
+        attributes.attr_set |= MOUNT_ATTR_RDONLY;
+    }
+    return mount_setattr(AT_FDCWD, target.c_str(), AT_RECURSIVE, &attributes, sizeof attributes) == 0;
+}
+
+// A share that cannot be shown is left out, so that the others can still be reached.
 void mountShare(const std::string& root, const Place& place) {
     const std::string target = root + "/" + place.name;
     std::error_code error;
     if (!std::filesystem::is_directory(place.folder, error)) {
-        std::fprintf(stderr, "velt-share-root: there is no folder %s\n", place.folder.c_str());
+        leaveOut(place.folder, error ? error.value() : ENOTDIR);
         return;
     }
     if (!std::filesystem::create_directories(target, error) && error) {
-        errno = error.value();
-        giveUp(target);
+        leaveOut(target, error.value());
+        return;
     }
     if (mount(place.folder.c_str(), target.c_str(), nullptr, MS_BIND | MS_REC, nullptr) < 0) {
-        giveUp("mount " + place.folder);
+        const int reason = errno;
+        rmdir(target.c_str());
+        leaveOut("mount " + place.folder, reason);
+        return;
     }
-    // Adds to what the server's own mounts are restricted by already; a plain remount would lift that.
-    mount_attr attributes{};
-    attributes.attr_set = MOUNT_ATTR_NOSUID | MOUNT_ATTR_NODEV;
-    if (place.readOnly) {
-        attributes.attr_set |= MOUNT_ATTR_RDONLY;
-    }
-    if (mount_setattr(AT_FDCWD, target.c_str(), AT_RECURSIVE, &attributes, sizeof attributes) < 0) {
-        giveUp("restrict " + place.folder);
+    if (!restrict(target, place.readOnly)) {
+        const int reason = errno;
+        // It must not stay there with more rights than it should give.
+        if (umount2(target.c_str(), MNT_DETACH) < 0) {
+            giveUp("umount " + place.folder);
+        }
+        rmdir(target.c_str());
+        leaveOut("restrict " + place.folder, reason);
     }
 }
 

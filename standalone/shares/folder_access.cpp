@@ -19,8 +19,8 @@ constexpr unsigned char answerRead = 1;
 constexpr unsigned char answerWrite = 2;
 constexpr unsigned char answerFailed = 128;
 
-// The system calls themselves: the C library's wrappers change every thread, for which they take locks that another
-// thread may have held at the fork.
+// The system calls themselves: the C library's wrappers change every thread, for which they take locks that
+// another thread may have held at the fork.
 bool takeIdentity(uid_t uid, const std::vector<gid_t>& gids) {
     return syscall(SYS_setgroups, gids.size(), gids.data()) == 0 &&
            syscall(SYS_setresgid, gids[0], gids[0], gids[0]) == 0 &&

@@ -11,12 +11,13 @@
 
 namespace velt {
 
-/// Why these cannot be the shares of a server, in words that follow a colon ("share 2 (\"a/b\") ..."); nothing when they
-/// can.
+/// Why these cannot be the shares of a server, in words that follow a colon ("share 2 (\"a/b\") ...");
+/// nothing when they can.
 std::optional<std::string> flawOf(const std::vector<ShareEntry>& shares);
 
-/// Reads the file's text: JSON in its strict form, the keys as renderShares writes them, of which "comment", "ftp", "users"
-/// and "groups" may be absent. Nothing when the text does not have this form; `flaw` then says why, as above.
+/// Reads the file's text: JSON in its strict form, the keys as renderShares writes them, of which "comment",
+/// "ftp", "users" and "groups" may be absent. Nothing when the text does not have this form; `flaw` then says
+/// why, as above.
 std::optional<std::vector<ShareEntry>> parseShares(std::string_view text, std::string& flaw);
 
 /// The text of shares that have no flaw.

@@ -17,10 +17,10 @@ enum class SharePrivilege {
     denied = 4, ///< the store refuses, or the file system does not let the account in
 };
 
-/// What the store grants the user or, when there is no such user, group `account`, and the file system allows it,
-/// whichever is less. An entry for the user decides before those for its groups; of these a refusal counts first,
-/// then the right to write. A group is checked in the file system as a stranger who belongs to it. Nothing, with
-/// the last error set, when the file system cannot be asked. Thread-safe.
+/// What the store grants the user or, when there is no such user, group `account`, and the file system allows
+/// it, whichever is less. An entry for the user decides before those for its groups; of these a refusal
+/// counts first, then the right to write. A group is checked in the file system as a stranger who belongs to
+/// it. Nothing, with the last error set, when the file system cannot be asked. Thread-safe.
 std::optional<SharePrivilege> privilegeOn(const ShareEntry& share, const std::string& account);
 
 } // namespace velt

@@ -1,5 +1,6 @@
 #include "standalone/sshd/host_keys.h"
 
+#include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/process.h"
@@ -7,10 +8,16 @@
 #include "standalone/daemon_test.h"
 #include "standalone/supervise/last_words.h"
 
+#include <algorithm>
+#include <array>
+#include <memory>
 #include <string>
+#include <string_view>
 
 namespace velt {
 namespace {
+
+constexpr std::array<std::string_view, 2> kinds{"ed25519", "rsa"};
 
 // ssh-keygen writes in place, so the key is made aside and stored whole; the public half comes first, so
 // that a private key never stands alone.
@@ -35,6 +42,39 @@ int makeKey(const std::string& kind, const std::filesystem::path& place) {
     return replaceFile(place, *key, 0600);
 }
 
+std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {
+    std::vector<std::filesystem::path> keys;
+    for (const std::string_view kind : kinds) {
+        keys.push_back(folder / ("host_" + std::string(kind) + "_key"));
+    }
+    return keys;
+}
+
+bool isThere(const std::filesystem::path& path) {
+    std::error_code error;
+    return std::filesystem::exists(path, error);
+}
+
+int makeMissing(const std::vector<std::filesystem::path>& keys) {
+    for (std::size_t i = 0; i < keys.size(); i++) {
+        if (!isThere(keys[i]) && makeKey(std::string(kinds[i]), keys[i]) < 0) {
+            return -1;
+        }
+    }
+    return 0;
+}
+
+// Something has to stand in the configuration that a daemon is to test, also where nothing may be stored.
+std::optional<std::vector<std::filesystem::path>> throwAwayKeys() {
+    thread_local std::unique_ptr<ScratchFolder> folder;
+    folder = std::make_unique<ScratchFolder>();
+    if (!*folder) {
+        return std::nullopt;
+    }
+    auto keys = keysIn(folder->path());
+    return makeMissing(keys) == 0 ? std::optional(std::move(keys)) : std::nullopt;
+}
+
 } // namespace
 
 std::optional<std::vector<std::filesystem::path>> hostKeys() {
@@ -42,16 +82,14 @@ std::optional<std::vector<std::filesystem::path>> hostKeys() {
     if (!lock) {
         return std::nullopt;
     }
-    std::vector<std::filesystem::path> keys;
-    for (const std::string kind : {"ed25519", "rsa"}) {
-        const auto place = statePath("/var/lib/velt/ssh/host_" + kind + "_key");
-        std::error_code error;
-        if (!std::filesystem::exists(place, error) && makeKey(kind, place) < 0) {
-            return std::nullopt;
-        }
-        keys.push_back(place);
+    auto keys = keysIn(statePath("/var/lib/velt/ssh"));
+    if (std::ranges::all_of(keys, isThere)) {
+        return keys;
     }
-    return keys;
+    if (perform(Effect::store, "host keys", [&] { return makeMissing(keys); }) < 0) {
+        return std::nullopt;
+    }
+    return std::ranges::all_of(keys, isThere) ? std::optional(std::move(keys)) : throwAwayKeys();
 }
 
 } // namespace velt

@@ -8,9 +8,10 @@
 
 namespace velt {
 
-/// The private host keys, Ed25519 and RSA, below "/var/lib/velt/ssh" of the state root; a missing one is made. They are not those of
-/// an SSH service that the server may run besides. Nothing, with the last error set, when a key cannot be made.
-/// Thread-safe.
+/// The private host keys, Ed25519 and RSA, below "/var/lib/velt/ssh" of the state root; a missing one is
+/// made. Where the thread's hook leaves the store of them undone, throw-away ones that last until the
+/// thread's next call or its end. They are not those of an SSH service that the server may run besides.
+/// Nothing, with the last error set, when a key cannot be made. Thread-safe.
 std::optional<std::vector<std::filesystem::path>> hostKeys();
 
 } // namespace velt

@@ -15,7 +15,8 @@ struct SshdPlaces {
     bool privileged = true; ///< else the daemon serves its own user alone, with keys and without passwords
 };
 
-/// The whole configuration: file transfer and nothing else. The settings have passed checkSftpSettings. A pure function.
+/// The whole configuration: file transfer and nothing else. The settings have passed checkSftpSettings. A
+/// pure function.
 std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places);
 
 } // namespace velt

@@ -1,8 +1,10 @@
 #include "standalone/tls/certificate.h"
 
+#include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemon_test.h"
 #include "standalone/tls/digest.h"
 #include "standalone/tls/openssl_owners.h"
 #include "standalone/tls/self_signed.h"
@@ -68,10 +70,11 @@ std::optional<ServerCertificate> load(const Pair& pair) {
         return refuse(pair.key, "does not hold the key of the certificate beside it");
     }
     return ServerCertificate{pair.certificate, pair.key, kind == EVP_PKEY_RSA,
-                             sha256(*certificateText + *keyText)};
+                             sha256(*certificateText + *keyText), nullptr};
 }
 
-// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good here too.
+// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good
+// here too.
 bool isUsable(const Pair& pair) {
     const auto certificateText = readFile(pair.certificate);
     const auto keyText = readFile(pair.key);
@@ -95,6 +98,20 @@ int makeOwn(const Pair& pair) {
     return replaceFile(pair.certificate, made->certificate, 0644);
 }
 
+// Something has to stand in the configuration that a daemon is to test, also where nothing may be stored.
+std::optional<ServerCertificate> throwAway() {
+    auto folder = std::make_shared<ScratchFolder>();
+    const Pair pair{folder->path() / "server.crt", folder->path() / "server.key"};
+    if (!*folder || makeOwn(pair) < 0) {
+        return std::nullopt;
+    }
+    auto certificate = load(pair);
+    if (certificate) {
+        certificate->throwAway = std::move(folder);
+    }
+    return certificate;
+}
+
 bool isThere(const std::filesystem::path& path) {
     std::error_code error;
     return std::filesystem::exists(path, error);
@@ -112,10 +129,13 @@ std::optional<ServerCertificate> serverCertificate() {
     if (!lock) {
         return std::nullopt;
     }
-    if (!isUsable(own) && makeOwn(own) < 0) {
+    if (isUsable(own)) {
+        return load(own);
+    }
+    if (perform(Effect::store, "certificate", [&] { return makeOwn(own); }) < 0) {
         return std::nullopt;
     }
-    return load(own);
+    return isUsable(own) ? load(own) : throwAway();
 }
 
 } // namespace velt

@@ -3,10 +3,13 @@
 #define VELT_STANDALONE_TLS_CERTIFICATE_H
 
 #include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
 
 namespace velt {
+
+class ScratchFolder;
 
 struct ServerCertificate {
     std::filesystem::path
@@ -14,12 +17,14 @@ struct ServerCertificate {
     std::filesystem::path key; ///< PEM
     bool isRsa = false;        ///< else it is an elliptic curve's
     std::string fingerprint;   ///< changes when the certificate or its key does
+    std::shared_ptr<const ScratchFolder> throwAway; ///< holds the two files when they are for a test only
 };
 
-/// The administrator's certificate ("/etc/velt/tls/server.crt" and ".key" below the state root) if given, else a self-signed one,
-/// made at the first call and again once it has run out. Nothing, with the last error set, when a file cannot be read or
-/// written, key and certificate do not belong together, or the kind of key is neither RSA nor an elliptic curve.
-/// Thread-safe.
+/// The administrator's certificate ("/etc/velt/tls/server.crt" and ".key" below the state root) if given,
+/// else a self-signed one, made at the first call and again once it has run out. Where the thread's hook
+/// leaves the store of it undone, a throw-away one that is gone with the result. Nothing, with the last error
+/// set, when a file cannot be read or written, key and certificate do not belong together, or the kind of key
+/// is neither RSA nor an elliptic curve. Thread-safe.
 std::optional<ServerCertificate> serverCertificate();
 
 } // namespace velt

@@ -22,7 +22,8 @@ struct SelfSigned {
     std::string key;         ///< PEM, not encrypted
 };
 
-/// Makes a key (ECDSA P-256) and a certificate for it that is valid from now on for ten years. Nothing when the library fails.
+/// Makes a key (ECDSA P-256) and a certificate for it that is valid from now on for ten years. Nothing when
+/// the library fails.
 std::optional<SelfSigned> makeSelfSigned(const CertificateNames& names);
 
 } // namespace velt

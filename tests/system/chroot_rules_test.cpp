@@ -199,8 +199,24 @@ TEST_F(ChrootRules, findAShareThatIsMadeLater) {
     saveRules({"u:1001:/later"});
     EXPECT_EQ(rootOf("alice"), "530");
     writeFile(addShare("later", "later", ShareGrant::none) / "file", "x");
-    ASSERT_EQ(refreshShareMap(), 0) << lastErrorSentence();
     EXPECT_EQ(rootOf("alice"), "file\r\n");
+}
+
+TEST_F(ChrootRules, followAShareThatIsMovedOrRemoved) {
+    writeFile(addShare("moving", "before", ShareGrant::none) / "old", "x");
+    start();
+    saveRules({"u:1001:/moving"});
+    EXPECT_EQ(rootOf("alice"), "old\r\n");
+    auto shares = allShares();
+    ASSERT_TRUE(shares);
+    shares->back().path = "/mnt/srv/after";
+    fs::create_directories("/mnt/srv/after");
+    writeFile("/mnt/srv/after/new", "x");
+    ASSERT_EQ(saveShares(*shares), 0) << lastErrorSentence();
+    EXPECT_EQ(rootOf("alice"), "new\r\n");
+    shares->pop_back();
+    ASSERT_EQ(saveShares(*shares), 0) << lastErrorSentence();
+    EXPECT_EQ(rootOf("alice"), "530");
 }
 
 } // namespace

@@ -63,6 +63,31 @@ TEST_F(FtpService, unconfinedUsersSeeTheOfferedSharesSideBySide) {
         << "the server's own mounts stay";
 }
 
+TEST_F(FtpService, aShareThatStartsWithDotsIsShown) {
+    writeFile(addShare("..data", "dots", ShareGrant::none) / "file", "dotted");
+    record.user_chroot = 0;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.receive("RETR /..data/file"), "dotted");
+}
+
+TEST_F(FtpService, aShareThatCannotBeMountedIsLeftOut) {
+    writeFile(addShare("music", "music", ShareGrant::none) / "song", "la");
+    // A folder of another mount name space can be seen there, and not be mounted.
+    auto shares = allShares();
+    ASSERT_TRUE(shares);
+    shares->push_back({"stubborn", "", "/proc/1/root/usr", true, {}, {}});
+    ASSERT_TRUE(fs::is_directory(shares->back().path));
+    ASSERT_EQ(saveShares(*shares), 0) << lastErrorSentence();
+    record.user_chroot = 0;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(namesIn(session), "music\r\n");
+    EXPECT_EQ(session.receive("RETR /music/song"), "la");
+}
+
 TEST_F(FtpService, anonymousUsersAreRefusedByDefault) {
     start();
     EXPECT_EQ(FtpSession(port).logIn("anonymous", "a@b"), 530);

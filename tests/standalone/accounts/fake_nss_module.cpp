@@ -1,13 +1,15 @@
-// A name service module with three users and one group. Its records are larger than the first buffer that callers
-// offer, so that they have to grow it.
+// A name service module with three users and one group. Its records are larger than the first buffer that
+// callers offer, so that they have to grow it.
 #include <grp.h>
 #include <nss.h>
 #include <pwd.h>
 
 #include <cerrno>
+#include <chrono>
 #include <cstdlib>
 #include <cstring>
 #include <string>
+#include <thread>
 
 #define JOIN_NAMES(source, name) _nss_##source##_##name
 #define ENTRY(source, name) JOIN_NAMES(source, name)
@@ -87,6 +89,10 @@ nss_status ENTRY(FAKE_SOURCE, initgroups_dyn)(const char*, gid_t, long*, long*, 
 
 nss_status ENTRY(FAKE_SOURCE, setpwent)(int) {
     position = 0;
+    // A domain that is far away.
+    if (const char* delay = std::getenv("FAKE_NSS_DELAY_MS"); delay != nullptr) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(delay)));
+    }
     return NSS_STATUS_SUCCESS;
 }
 

@@ -14,11 +14,13 @@ namespace {
 
 using Milliseconds = std::chrono::duration<double, std::milli>;
 
+// The goals are for what is installed, and hold as they are where that is tested. Without the optimiser, or
+// with a sanitizer's checks, the same work takes several times longer; the factors are wide, and what is left
+// of the goals there only notices work that has become another order of magnitude.
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 constexpr double slowness = 20;
 #elif defined(__OPTIMIZE__)
-// The goals are for a machine that does nothing else; a test must not fail because others use it.
-constexpr double slowness = 3;
+constexpr double slowness = 1;
 #else
 constexpr double slowness = 10;
 #endif

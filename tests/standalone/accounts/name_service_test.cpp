@@ -5,6 +5,10 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <cstdlib>
+#include <thread>
+
 namespace velt {
 namespace {
 
@@ -17,10 +21,11 @@ protected:
     }
     ~NameServiceTest() override { setAccountSources({}); }
 
-    void useServices(std::string_view nsswitch, const std::filesystem::path& modules) {
+    void useServices(std::string_view nsswitch, const std::filesystem::path& modules,
+                     std::chrono::seconds lifetime = std::chrono::seconds(30)) {
         folder_.write("nsswitch.conf", nsswitch);
         setAccountSources({folder_.path() / "passwd", folder_.path() / "group", folder_.path() / "login.defs",
-                           folder_.path() / "nsswitch.conf", modules});
+                           folder_.path() / "nsswitch.conf", modules, lifetime});
     }
 
     std::vector<std::string> listing() {
@@ -60,6 +65,25 @@ TEST_F(NameServiceTest, FindsGroupsAndMemberships) {
     EXPECT_EQ(groupByName("winbind-people")->source, sourceDomain);
     EXPECT_EQ(groupById(4'000'002)->name, "sss-people");
     EXPECT_EQ(groupsOf(*userByName("OFFICE\\anna")), (std::vector<gid_t>{4'000'000, 4'000'001, 4'000'002}));
+}
+
+TEST_F(NameServiceTest, ASlowDomainHoldsUpNobodyWhoKnowsItsFormerAnswer) {
+    using namespace std::chrono_literals;
+    useServices("passwd: files winbind\n", FAKE_MODULE_FOLDER, 0s);
+    const Lines known = listing();
+    ASSERT_EQ(known.size(), 4U);
+    ASSERT_EQ(setenv("FAKE_NSS_DELAY_MS", "3000", 1), 0);
+    std::atomic<bool> answered = false;
+    std::thread asking([&] {
+        listing();
+        answered = true;
+    });
+    std::this_thread::sleep_for(500ms);
+    EXPECT_EQ(listing(), known);
+    EXPECT_EQ(groupById(1000)->name, "local1");
+    EXPECT_FALSE(answered) << "the domain was asked meanwhile";
+    asking.join();
+    unsetenv("FAKE_NSS_DELAY_MS");
 }
 
 TEST_F(NameServiceTest, AModuleThatIsNotInUseIsNotAsked) {

@@ -36,7 +36,8 @@ TEST(LoginReader, agreesWithTheStoreOnEveryRule) {
 
 class LoginReaderFile : public testing::Test {
 protected:
-    // The lines after the header; the last one is "(damaged)" where reading fails, the only one where opening does.
+    // The lines after the header; the last one is "(damaged)" where reading fails, the only one where opening
+    // does.
     std::vector<std::string> read(const std::string& contents) {
         const auto file = folder_.write("file", contents);
         chmod(file.c_str(), 0600);

@@ -98,8 +98,13 @@ double secondsFor(int pushes) {
 
 // Growth by a constant would take a hundred times as long for ten times the entries.
 TEST(StringList, GrowsInLinearTime) {
-    const double small = std::min(secondsFor(10'000), secondsFor(10'000));
-    const double large = secondsFor(100'000);
+    // The best of some runs of each is what the code costs; the rest is what else the machine does.
+    double small = 1e9;
+    double large = 1e9;
+    for (int run = 0; run < 4; ++run) {
+        small = std::min(small, secondsFor(10'000));
+        large = std::min(large, secondsFor(100'000));
+    }
     ASSERT_GT(small, 0);
     EXPECT_LT(large, 40 * small);
     EXPECT_LT(large, 1.0);

@@ -1,7 +1,9 @@
+#include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemon_test.h"
 #include "standalone/settings/candidate.h"
+#include "standalone/standalone.h"
 #include "standalone/supervise/last_words.h"
 #include "tests/standalone/proftpd/example.h"
 #include "tests/standalone/support/temporary_folder.h"
@@ -38,6 +40,16 @@ TEST_F(FtpCandidate, leavesNothingOfTheTestBehind) {
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
+TEST_F(FtpCandidate, isTestedWithAThrowAwayCertificateWhereNothingMayBeStored) {
+    setEffectHook([](Effect, std::string_view) { return EffectDecision{false, 0}; });
+    FtpSettings settings = plainSettings();
+    settings.record.service_flags = VELT_FTP_SERVICE_TLS;
+    EXPECT_EQ(testFtpCandidate(settings), 0) << lastErrorSentence();
+    setEffectHook({});
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/tls"));
+    EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
+}
+
 TEST_F(FtpCandidate, isRefusedInTheDaemonsOwnWords) {
     FtpSettings settings = plainSettings();
     settings.timeout = -1;
@@ -61,6 +73,17 @@ TEST_F(FtpCandidate, isRefusedBelowARootThatTheConfigurationCannotName) {
     setStateRoot(root_.path() / "100%u");
     EXPECT_LT(testFtpCandidate(plainSettings()), 0);
     EXPECT_NE(lastErrorSentence().find("cannot hold"), std::string::npos) << lastErrorSentence();
+}
+
+TEST_F(FtpCandidate, whatAKilledProcessLeftIsSweptAndWhatIsInUseStays) {
+    root_.write("run/velt/test.Killed/key", "private");
+    root_.write("run/velt/ftp/proftpd.conf", "in use");
+    const ScratchFolder used;
+    ASSERT_TRUE(used);
+    ASSERT_EQ(openState(root_.path()), 0) << lastErrorSentence();
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "run/velt/test.Killed"));
+    EXPECT_TRUE(std::filesystem::exists(used.path()));
+    EXPECT_EQ(root_.read("run/velt/ftp/proftpd.conf"), "in use");
 }
 
 TEST(LastWords, areWhatExplainsTheFailure) {

@@ -17,6 +17,12 @@ protected:
         EXPECT_GE(VELTFTPConfGet(&read), 0) << lastErrorSentence();
         return read;
     }
+    static void switchOn() {
+        auto conf = record();
+        conf.service_flags = VELT_FTP_SERVICE_PLAIN;
+        ASSERT_GE(VELTFTPConfSet(conf), 0) << lastErrorSentence();
+        test::fakeCandidate().ftp.clear();
+    }
     static std::string externalAddress() {
         std::array<char, 16> buffer{};
         const int result = VLIBCFileGetKeyValue("/etc/veltinfo.conf", "ftp_ext_ip", buffer.data(), 16, 0);
@@ -80,6 +86,7 @@ TEST_F(FtpContract, EachSettingIsStoredAlone) {
 
 TEST_F(FtpContract, ARefusedRecordLeavesTheStoredOne) {
     auto conf = record();
+    conf.service_flags = VELT_FTP_SERVICE_PLAIN;
     conf.enable_fxp = 1;
     ASSERT_GE(VELTFTPConfSet(conf), 0);
     const std::string before = root_.read("etc/velt/ftp.conf");
@@ -94,6 +101,7 @@ TEST_F(FtpContract, ARefusedRecordLeavesTheStoredOne) {
 }
 
 TEST_F(FtpContract, TheDaemonIsAskedAboutWhatWouldBeStored) {
+    switchOn();
     ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
     ASSERT_GE(VELTFTPTimeOutSet(60), 0);
     auto conf = record();
@@ -109,6 +117,8 @@ TEST_F(FtpContract, TheDaemonIsAskedAboutWhatWouldBeStored) {
 }
 
 TEST_F(FtpContract, WhatTheDaemonRefusesIsNotStored) {
+    switchOn();
+    const std::string before = root_.read("etc/velt/ftp.conf");
     test::fakeCandidate().refuses = true;
     EXPECT_LT(VELTFTPConfSet(record()), 0);
     EXPECT_LT(VELTFTPTimeOutSet(1), 0);
@@ -118,7 +128,25 @@ TEST_F(FtpContract, WhatTheDaemonRefusesIsNotStored) {
     EXPECT_LT(VELTFTPUmaskEnabledSet(false), 0);
     EXPECT_LT(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0);
     EXPECT_EQ(lastErrorSentence(), "The daemon does not take it.");
-    EXPECT_FALSE(std::filesystem::exists(place("/etc")));
+    EXPECT_EQ(root_.read("etc/velt/ftp.conf"), before);
+    EXPECT_FALSE(std::filesystem::exists(place("/etc/veltinfo.conf")));
+}
+
+TEST_F(FtpContract, ADaemonThatRefusesEverythingCanBeSwitchedOffButNotOn) {
+    switchOn();
+    test::fakeCandidate().refuses = true;
+    auto conf = record();
+    conf.service_flags = 0;
+    EXPECT_GE(VELTFTPConfSet(conf), 0) << lastErrorSentence();
+    EXPECT_GE(VELTFTPTimeOutSet(60), 0) << lastErrorSentence();
+    EXPECT_GE(VELTFTPFIPSEnabledSet(1), 0) << lastErrorSentence();
+    EXPECT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
+    EXPECT_LT(VELTFTPTimeOutSet(-1), 0) << "numbers are checked all the same";
+    for (const int flags : {VELT_FTP_SERVICE_PLAIN, VELT_FTP_SERVICE_TLS}) {
+        conf.service_flags = flags;
+        EXPECT_LT(VELTFTPConfSet(conf), 0);
+    }
+    EXPECT_EQ(record().service_flags, 0);
 }
 
 TEST_F(FtpContract, AnyShareNameIsStoredAsItIs) {

@@ -37,6 +37,17 @@ TEST_F(SftpContract, RefusesWhatSshdWouldRefuse) {
     EXPECT_FALSE(std::filesystem::exists(place("/etc")));
 }
 
+TEST_F(SftpContract, ADaemonThatRefusesEverythingCanBeSwitchedOff) {
+    ASSERT_GE(VELTSFTPConfigSet(1, 2222), 0);
+    test::fakeCandidate().refuses = true;
+    EXPECT_GE(VELTSFTPConfigSet(0, 2222), 0) << lastErrorSentence();
+    EXPECT_LT(VELTSFTPConfigSet(0, 65536), 0) << "numbers are checked all the same";
+    EXPECT_LT(VELTSFTPConfigSet(1, 2222), 0);
+    _tag_VELT_SFTP_CONFIG_ conf{};
+    ASSERT_GE(VELTSFTPConfigGet(1, &conf), 0);
+    EXPECT_EQ(conf.enable, 0);
+}
+
 TEST_F(SftpContract, KnowsOneRecordOnly) {
     _tag_VELT_SFTP_CONFIG_ conf{};
     EXPECT_LT(VELTSFTPConfigGet(0, &conf), 0);

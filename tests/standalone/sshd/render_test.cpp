@@ -1,3 +1,4 @@
+#include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/candidate.h"
@@ -7,6 +8,8 @@
 #include "tests/standalone/support/temporary_folder.h"
 
 #include <sys/stat.h>
+
+#include <thread>
 
 namespace velt::test {
 namespace {
@@ -46,6 +49,21 @@ TEST_F(SftpCandidate, isRefusedInTheDaemonsOwnWords) {
     EXPECT_LT(testSftpCandidate({true, 65536}), 0);
     EXPECT_NE(lastErrorSentence().find("Badly formatted port number"), std::string::npos)
         << lastErrorSentence();
+}
+
+TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
+    std::vector<std::string> effects;
+    std::thread([&] {
+        setEffectHook([&](Effect effect, std::string_view subject) {
+            effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
+            return EffectDecision{false, 0};
+        });
+        EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
+        EXPECT_LT(testSftpCandidate({true, 65536}), 0);
+    }).join();
+    EXPECT_EQ(effects, (std::vector<std::string>{"store host keys", "store host keys"}));
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/ssh"));
+    EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
 TEST_F(SftpCandidate, keepsItsKeys) {

@@ -1,3 +1,4 @@
+#include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
@@ -82,6 +83,23 @@ TEST_F(ServerCertificates, areMadeOnceAndKeptPrivate) {
     const auto second = serverCertificate();
     ASSERT_TRUE(second);
     EXPECT_EQ(second->fingerprint, first->fingerprint);
+}
+
+TEST_F(ServerCertificates, areForATestOnlyWhereNothingMayBeStored) {
+    std::vector<std::string> effects;
+    setEffectHook([&](Effect effect, std::string_view subject) {
+        effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
+        return EffectDecision{false, 0};
+    });
+    auto certificate = serverCertificate();
+    setEffectHook({});
+    ASSERT_TRUE(certificate) << lastErrorSentence();
+    EXPECT_EQ(effects, std::vector<std::string>{"store certificate"});
+    const auto key = certificate->key;
+    EXPECT_TRUE(std::filesystem::exists(key));
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/tls"));
+    certificate.reset();
+    EXPECT_FALSE(std::filesystem::exists(key));
 }
 
 TEST_F(ServerCertificates, areMadeAnewWhenKeyAndCertificateDoNotMatch) {
