@@ -4,12 +4,9 @@
 #include "standalone/core/state_root.h"
 
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <cstdlib>
 #include <cstring>
-#include <fstream>
-#include <iterator>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -24,21 +21,12 @@ void FtpService::SetUp() {
     std::strcpy(record.portnum, "2121");
     record.service_flags = VELT_FTP_SERVICE_PLAIN;
     record.user_chroot = 1;
-    unsigned id = aliceId;
-    for (const char* name : {"alice", "bob", "carol"}) {
-        writeFile(fs::path("/mnt/home") / name / "home-of", name, id++);
-    }
+    furnishHomes();
 }
 
 void FtpService::TearDown() {
     daemon_.stop();
-    for (const char* folder :
-         {"/mnt/root", "/mnt/srv", "/mnt/home/alice", "/mnt/home/bob", "/mnt/home/carol"}) {
-        std::error_code error;
-        for (const auto& entry : fs::directory_iterator(folder, error)) {
-            fs::remove_all(entry, error);
-        }
-    }
+    clearFolders();
 }
 
 void FtpService::letAnonymousIn(const std::string& share) {
@@ -79,21 +67,6 @@ void FtpService::saveRules(const std::vector<std::string>& rules) {
 ProcessResult FtpService::curl(std::vector<std::string> arguments) {
     arguments.insert(arguments.begin(), {"curl", "--silent", "--show-error", "--max-time", "20"});
     return runProcess(arguments, {}, std::chrono::seconds(30));
-}
-
-void writeFile(const fs::path& path, const std::string& contents, unsigned owner) {
-    std::ofstream(path, std::ios::binary) << contents;
-    EXPECT_EQ(chown(path.c_str(), owner, owner), 0) << path;
-}
-
-std::string readFileText(const fs::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
-}
-
-unsigned modeOf(const fs::path& path) {
-    struct stat facts {};
-    return stat(path.c_str(), &facts) == 0 ? facts.st_mode & 07777U : 0;
 }
 
 } // namespace velt::test

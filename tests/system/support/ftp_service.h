@@ -6,6 +6,7 @@
 #include "standalone/core/process.h"
 #include "standalone/shares/share_store.h"
 #include "tests/system/support/daemon_process.h"
+#include "tests/system/support/files.h"
 #include "tests/system/support/ftp_session.h"
 #include "tests/system/support/private_world.h"
 
@@ -48,11 +49,6 @@ private:
     DaemonProcess daemon_;
     std::vector<ShareEntry> shares_;
 };
-
-void writeFile(const std::filesystem::path& path, const std::string& contents, unsigned owner = 0);
-std::string readFileText(const std::filesystem::path& path);
-/// The permission bits; 0 when there is no such file.
-unsigned modeOf(const std::filesystem::path& path);
 
 } // namespace velt::test
 
