@@ -1,5 +1,6 @@
 #include "standalone/services/supervise_backend.h"
 
+#include "standalone/core/input_wait.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/unique_fd.h"
@@ -8,7 +9,6 @@
 #include "standalone/supervise/control_channel.h"
 
 #include <fcntl.h>
-#include <poll.h>
 #include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -75,22 +75,17 @@ int spawnDetached(std::vector<std::string> arguments, int report) {
 
 /// What comes out of the pipe until its end; nothing when that does not come within the limit.
 std::optional<std::string> readReport(int descriptor) {
-    using Clock = std::chrono::steady_clock;
-    const auto deadline = Clock::now() + startLimit;
+    const auto deadline = std::chrono::steady_clock::now() + startLimit;
     std::string report;
     std::array<char, 4096> buffer{};
-    for (;;) {
-        const auto left = std::chrono::duration_cast<milliseconds>(deadline - Clock::now());
-        pollfd event{descriptor, POLLIN, 0};
-        if (left.count() <= 0 || ::poll(&event, 1, static_cast<int>(left.count())) == 0) {
-            return std::nullopt;
-        }
-        const ssize_t length = event.revents != 0 ? ::read(descriptor, buffer.data(), buffer.size()) : 0;
-        if (event.revents != 0 && length <= 0) {
+    while (waitForInput(descriptor, deadline)) {
+        const ssize_t length = ::read(descriptor, buffer.data(), buffer.size());
+        if (length <= 0) {
             return report;
         }
         report.append(buffer.data(), static_cast<std::size_t>(length));
     }
+    return std::nullopt;
 }
 
 } // namespace

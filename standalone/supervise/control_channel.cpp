@@ -1,5 +1,7 @@
 #include "standalone/supervise/control_channel.h"
 
+#include "standalone/core/input_wait.h"
+
 #include <fcntl.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
@@ -8,6 +10,7 @@
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <charconv>
 #include <cstring>
 #include <string_view>
@@ -50,17 +53,33 @@ private:
     sockaddr_un address_{};
 };
 
-void setTimeouts(int descriptor, std::chrono::milliseconds limit) {
+using Clock = std::chrono::steady_clock;
+
+void limitSending(int descriptor, std::chrono::milliseconds limit) {
     timeval time{};
     time.tv_sec = limit.count() / 1000;
     time.tv_usec = (limit.count() % 1000) * 1000;
-    ::setsockopt(descriptor, SOL_SOCKET, SO_RCVTIMEO, &time, sizeof time);
     ::setsockopt(descriptor, SOL_SOCKET, SO_SNDTIMEO, &time, sizeof time);
 }
 
-std::optional<std::string> receiveMessage(int descriptor) {
+/// Repeats a call that a signal of the process has interrupted, as long as there is time.
+template<class Call> bool succeeds(const Call& call, Clock::time_point deadline) {
+    for (;;) {
+        if (call() >= 0) {
+            return true;
+        }
+        if (errno != EINTR || Clock::now() >= deadline) {
+            return false;
+        }
+    }
+}
+
+std::optional<std::string> receiveMessage(int descriptor, Clock::time_point deadline) {
+    if (!waitForInput(descriptor, deadline)) {
+        return std::nullopt;
+    }
     std::string message(largestMessage, '\0');
-    const ssize_t length = ::recv(descriptor, message.data(), message.size(), 0);
+    const ssize_t length = ::recv(descriptor, message.data(), message.size(), MSG_DONTWAIT);
     if (length <= 0) {
         return std::nullopt;
     }
@@ -167,10 +186,11 @@ void ControlListener::serve(const std::function<std::string(const ControlRequest
     if (peer < 0) {
         return;
     }
-    setTimeouts(peer, std::chrono::seconds(1)); // one who connects and says nothing holds nobody up for long
+    constexpr std::chrono::seconds limit(1); // one who connects and says nothing holds nobody up for long
+    limitSending(peer, limit);
     if (maySpeak(peer)) {
         std::string answer = "the request was not understood";
-        if (const auto message = receiveMessage(peer)) {
+        if (const auto message = receiveMessage(peer, Clock::now() + limit)) {
             const auto request = decodeRequest(*message);
             answer = request ? handle(*request) : answer;
         }
@@ -187,12 +207,14 @@ std::optional<std::string> askSupervisor(const std::filesystem::path& directory,
     if (descriptor < 0) {
         return std::nullopt;
     }
-    setTimeouts(descriptor, limit);
+    const Clock::time_point deadline = Clock::now() + limit;
+    limitSending(descriptor, limit);
     const std::string message = encodeRequest(request);
     std::optional<std::string> answer;
-    if (::connect(descriptor, address.get(), SocketAddress::size()) == 0 &&
-        ::send(descriptor, message.data(), message.size(), MSG_NOSIGNAL) >= 0) {
-        answer = receiveMessage(descriptor);
+    const auto connect = [&] { return ::connect(descriptor, address.get(), SocketAddress::size()); };
+    const auto send = [&] { return ::send(descriptor, message.data(), message.size(), MSG_NOSIGNAL); };
+    if (succeeds(connect, deadline) && succeeds(send, deadline)) {
+        answer = receiveMessage(descriptor, deadline);
     }
     ::close(descriptor);
     if (!answer) {

@@ -2,6 +2,9 @@
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/module_service.h"
 
+#include <sys/time.h>
+
+#include <csignal>
 #include <filesystem>
 
 namespace velt::test {
@@ -87,6 +90,39 @@ TEST_F(ModuleFailure, passesOnWhatTheDaemonSays) {
     EXPECT_TRUE(contains(answer.sentence, "server.crt")) << answer.sentence;
     EXPECT_TRUE(answer.sentence.ends_with(".")) << answer.sentence;
     EXPECT_EQ(fetchHome(), "alice") << "the service goes on with its former settings";
+}
+
+/// While it is there this process is interrupted every few milliseconds.
+class Interruptions {
+public:
+    Interruptions() {
+        struct sigaction action {};
+        action.sa_handler = [](int) {}; // without SA_RESTART
+        EXPECT_EQ(sigaction(SIGALRM, &action, nullptr), 0);
+        every({0, 3000});
+    }
+    ~Interruptions() { every({0, 0}); }
+    Interruptions(const Interruptions&) = delete;
+    Interruptions& operator=(const Interruptions&) = delete;
+
+private:
+    static void every(timeval interval) {
+        const itimerval timer{interval, interval};
+        EXPECT_EQ(setitimer(ITIMER_REAL, &timer, nullptr), 0);
+    }
+};
+
+TEST_F(ModuleFailure, noneComesFromASignalOfTheHost) {
+    const Interruptions interruptions;
+    for (const char* changes :
+         {R"({"enable_ftps": true})", R"({"portnum": 2122})", R"({"enable_ftp": false})"}) {
+        const ModuleAnswer answer = setFtp(changes);
+        EXPECT_EQ(answer.code, 0) << changes << ": " << answer.sentence;
+    }
+    for (const char* parameters : {R"({"enable": true, "portnum": 2222})", R"({"enable": false})"}) {
+        const ModuleAnswer answer = setSftp(parameters);
+        EXPECT_EQ(answer.code, 0) << parameters << ": " << answer.sentence;
+    }
 }
 
 } // namespace
