@@ -16,7 +16,8 @@ ChrootRule ruleFromJson(const Json::Value& object) {
     return {textAt(object, "type"), textAt(object, "name"), textAt(object, "path")};
 }
 
-// The server takes any text that is not "user" for a group, and trips over an empty path when it loads the rules again.
+// The server takes any text that is not "user" for a group, and trips over an empty path when it loads the
+// rules again.
 std::string faultOf(const Json::Value& object) {
     if (!object.isObject() || !object["type"].isString() || !object["name"].isString() ||
         !object["path"].isString()) {

@@ -24,15 +24,15 @@ std::string ruleToText(const ChrootRule& rule);
 
 Json::Value rulesToJson(const ChrootRules& rules);
 
-/// The rules of an array of objects; other keys than "type", "name" and "path" are passed over. Each fault of the array is
-/// added to `faults`, in words.
+/// The rules of an array of objects; other keys than "type", "name" and "path" are passed over. Each fault of
+/// the array is added to `faults`, in words.
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults);
 
 /// What the server has stored.
 ChrootRules loadRules(ApiClient& api);
 
-/// Stores the rules in place of all stored ones, and loads them again: the server leaves out rules whose user or group it
-/// does not know. Throws Failure (refused) that names them.
+/// Stores the rules in place of all stored ones, and loads them again: the server leaves out rules whose user
+/// or group it does not know. Throws Failure (refused) that names them.
 void saveRules(ApiClient& api, const ChrootRules& rules);
 
 } // namespace velt::cli

@@ -22,7 +22,8 @@ struct Console {
     std::function<bool()> interrupted;
 };
 
-/// The text of the named file, or of the standard input for "-". Throws Failure (usage) when it cannot be read.
+/// The text of the named file, or of the standard input for "-". Throws Failure (usage) when it cannot be
+/// read.
 std::string readInput(Console& console, const std::string& name);
 
 } // namespace velt::cli

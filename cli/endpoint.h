@@ -31,8 +31,9 @@ struct Endpoint {
     std::string name() const { return socket.empty() ? url : socket; }
 };
 
-/// The options first, then VELT_URL, VELT_SOCKET and VELT_TOKEN, then the default socket. Throws Failure (usage) for an
-/// address that is no http or https URL, and for a token that would travel unencrypted to another machine.
+/// The options first, then VELT_URL, VELT_SOCKET and VELT_TOKEN, then the default socket. Throws Failure
+/// (usage) for an address that is no http or https URL, and for a token that would travel unencrypted to
+/// another machine.
 Endpoint findEndpoint(const EndpointOptions& options, Console& console);
 
 } // namespace velt::cli

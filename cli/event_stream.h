@@ -14,7 +14,8 @@ public:
 
     explicit EventStream(Handler handler) : handler_(std::move(handler)) {}
 
-    /// Takes the next piece and calls the handler for each event that it completes. Lines end with LF or CR LF.
+    /// Takes the next piece and calls the handler for each event that it completes. Lines end with LF or CR
+    /// LF.
     void feed(std::string_view piece);
 
 private:

@@ -145,7 +145,8 @@ void HttpClient::prepare(const std::string& path) {
 
     curl_easy_setopt(curl, CURLOPT_URL, (endpoint_.url + path).c_str());
     curl_easy_setopt(curl, CURLOPT_PROTOCOLS_STR, "http,https");
-    // A proxy from the environment would see the token, and a proxy cannot reach the loopback of this machine.
+    // A proxy from the environment would see the token, and a proxy cannot reach the loopback of this
+    // machine.
     curl_easy_setopt(curl, CURLOPT_PROXY, "");
     curl_easy_setopt(curl, CURLOPT_NOSIGNAL, 1L);
     curl_easy_setopt(curl, CURLOPT_ERRORBUFFER, handle_->reason);

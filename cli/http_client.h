@@ -27,13 +27,14 @@ public:
 
     const Endpoint& endpoint() const { return endpoint_; }
 
-    /// Sends one request; `path` starts with a slash and is encoded already, `body` is JSON. Any status is an answer.
-    /// Throws Failure (access) when there is none.
+    /// Sends one request; `path` starts with a slash and is encoded already, `body` is JSON. Any status is an
+    /// answer. Throws Failure (access) when there is none.
     HttpAnswer send(const std::string& method, const std::string& path,
                     const std::optional<std::string>& body);
 
-    /// Hands what a GET of `path` delivers to `onText`, until the server ends it, `onText` returns false or `stop`
-    /// returns true (asked once a second at least). The body of an answer other than 200 is returned instead.
+    /// Hands what a GET of `path` delivers to `onText`, until the server ends it, `onText` returns false or
+    /// `stop` returns true (asked once a second at least). The body of an answer other than 200 is returned
+    /// instead.
     HttpAnswer follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
                       const std::function<bool()>& stop);
 

@@ -7,8 +7,8 @@
 
 namespace velt::cli {
 
-/// The failure that an answer other than 200, 201 or 204 stands for: the exit code by its status, the problem's detail,
-/// fields, holder, code and request id as notes, and what to do next.
+/// The failure that an answer other than 200, 201 or 204 stands for: the exit code by its status, the
+/// problem's detail, fields, holder, code and request id as notes, and what to do next.
 Failure problemOf(const HttpAnswer& answer, const Endpoint& endpoint);
 
 } // namespace velt::cli

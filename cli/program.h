@@ -10,11 +10,12 @@
 
 namespace velt::cli {
 
-/// Runs the command that the words (without the program's name) name. Results go to the console's output, everything that
-/// went wrong to its error output.
+/// Runs the command that the words (without the program's name) name. Results go to the console's output,
+/// everything that went wrong to its error output.
 ExitCode runProgram(const std::vector<std::string>& words, Console& console);
 
-/// Every command as its words ("chroot rules add"), and every option of each ("--json"), for tests of what describes them.
+/// Every command as its words ("chroot rules add"), and every option of each ("--json"), for tests of what
+/// describes them.
 struct CommandDescription {
     std::string words;
     std::vector<std::string> options;

@@ -22,8 +22,8 @@ struct Session {
 /// A command, ready to run. Throws Failure.
 using Command = std::function<void(Session&)>;
 
-// Each adds commands with their options to the parser. The command that the words name is put into `chosen`, which outlives
-// the parser.
+// Each adds commands with their options to the parser. The command that the words name is put into `chosen`,
+// which outlives the parser.
 void addSettingsCommands(CLI::App& app, Command& chosen);
 void addShareCommands(CLI::App& app, Command& chosen);
 void addChrootCommands(CLI::App& app, Command& chosen);

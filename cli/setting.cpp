@@ -64,7 +64,8 @@ Setting utf8Setting(int version) {
     }
 }
 
-// A passive range without the switch, and the switch without a range, are refused or passed over by the server.
+// A passive range without the switch, and the switch without a range, are refused or passed over by the
+// server.
 void completePassiveRange(Json::Value& change, const Json::Value& current) {
     if (change.isMember("custom_port") && !change.isMember("custom_port_range")) {
         change["custom_port_range"] = true;

@@ -49,12 +49,12 @@ const char* describe(SettingType type);
 /// Whether the value has the JSON type of the setting.
 bool hasType(const Json::Value& value, SettingType type);
 
-/// The object that words of the form key=value name. Throws Failure (usage) for a word of another form, an unknown key, a
-/// key named twice, or a value that is not of the key's type.
+/// The object that words of the form key=value name. Throws Failure (usage) for a word of another form, an
+/// unknown key, a key named twice, or a value that is not of the key's type.
 Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::string>& words);
 
-/// The parameters for a "set" that changes what `wanted` names: with the required keys at their current values, and with
-/// the keys that the wanted ones have no effect without.
+/// The parameters for a "set" that changes what `wanted` names: with the required keys at their current
+/// values, and with the keys that the wanted ones have no effect without.
 Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted, const Json::Value& current);
 
 } // namespace velt::cli

@@ -20,8 +20,8 @@ Json::Value readSettings(ApiClient& api, const SettingGroup& group);
 /// Writes the settings.
 void showSettings(Session& session, const SettingGroup& group);
 
-/// Changes the settings that words of the form key=value name and writes what is different afterwards. A value that the
-/// server accepted but does not show is told on the error output.
+/// Changes the settings that words of the form key=value name and writes what is different afterwards. A
+/// value that the server accepted but does not show is told on the error output.
 void changeSettings(Session& session, const SettingGroup& group, const std::vector<std::string>& words);
 
 /// As {"key", "from", "to"}.

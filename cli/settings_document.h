@@ -10,7 +10,8 @@ namespace velt::cli {
 /// The whole of a server's settings: "format", "format_version", "chroot_rules", "security", "ftp", "sftp".
 Json::Value exportSettings(ApiClient& api);
 
-/// Every fault of a document, in words; none: it can be imported. Sections and keys may be absent, but none may be unknown.
+/// Every fault of a document, in words; none: it can be imported. Sections and keys may be absent, but none
+/// may be unknown.
 std::vector<std::string> documentFaults(const Json::Value& document);
 
 /// What one section of a document changes.
@@ -27,7 +28,8 @@ struct ImportPlan {
     std::vector<std::string> warnings; ///< what the document asks and the server cannot do
 };
 
-/// Compares a document without faults with the server. Nothing is changed before the steps are applied; `api` outlives them.
+/// Compares a document without faults with the server. Nothing is changed before the steps are applied; `api`
+/// outlives them.
 ImportPlan planImport(ApiClient& api, const Json::Value& document);
 
 } // namespace velt::cli

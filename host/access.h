@@ -1,8 +1,8 @@
 // Who may talk to the host.
 //
-// A Unix socket's peer is known by the kernel: root, the host's own user and the members of the administrators' group
-// are admins. Everybody else shows a bearer token. Requests that a page of another origin makes a browser send
-// are refused whoever sends them.
+// A Unix socket's peer is known by the kernel: root, the host's own user and the members of the
+// administrators' group are admins. Everybody else shows a bearer token. Requests that a page of another
+// origin makes a browser send are refused whoever sends them.
 #ifndef VELT_HOST_ACCESS_H
 #define VELT_HOST_ACCESS_H
 

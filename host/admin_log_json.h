@@ -13,8 +13,8 @@ namespace velt::host {
 
 Json::Value toObject(const AdminLogEntry& entry);
 
-/// Reads "since=...&event=...&actor=...&before=...&limit=...". Nothing, with the reason in `error`, when a part is
-/// unknown or has no such value.
+/// Reads "since=...&event=...&actor=...&before=...&limit=...". Nothing, with the reason in `error`, when a
+/// part is unknown or has no such value.
 std::optional<AdminLogQuery> parseLogQuery(const std::string& query, std::string& error);
 
 } // namespace velt::host

@@ -145,8 +145,8 @@ void readFile(Config& config, const std::string& file) {
     }
 }
 
-/// Lists in the file are replaced, not lengthened, by those of the command line: a host that listens where the
-/// administrator did not ask for is worse than one that does not.
+/// Lists in the file are replaced, not lengthened, by those of the command line: a host that listens where
+/// the administrator did not ask for is worse than one that does not.
 void forgetLists(Config& config, const std::string& name) {
     if (name == "listen") {
         config.listen.clear();

@@ -1,4 +1,5 @@
-// JSON as text: what arrives in bodies and leaves in answers. Thread-safe; each thread has its own reader and writer.
+// JSON as text: what arrives in bodies and leaves in answers. Thread-safe; each thread has its own reader and
+// writer.
 #ifndef VELT_HOST_JSON_TEXT_H
 #define VELT_HOST_JSON_TEXT_H
 

@@ -10,8 +10,8 @@
 
 namespace velt::host {
 
-/// 200 with the value or 204; else a problem with the module's code, what an administrator can act on, and for
-/// refused parameters the fields that broke their description.
+/// 200 with the value or 204; else a problem with the module's code, what an administrator can act on, and
+/// for refused parameters the fields that broke their description.
 HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outcome& outcome,
                        const OpenApi& openApi, const std::string& requestId);
 

@@ -36,7 +36,8 @@ struct Row {
     std::string name() const;
 };
 
-/// Filled at the start, then constant and safe to use from any thread. The modules stay loaded while it lives.
+/// Filled at the start, then constant and safe to use from any thread. The modules stay loaded while it
+/// lives.
 class ModuleTable {
 public:
     ModuleTable() = default;

@@ -32,8 +32,8 @@ public:
     /// Whether the document describes the row's parameters.
     bool describes(const Row& row) const;
 
-    /// The fields that break the description of the row's parameters, and what it expects of each. Only explains:
-    /// whether a request is accepted is the module's to say.
+    /// The fields that break the description of the row's parameters, and what it expects of each. Only
+    /// explains: whether a request is accepted is the module's to say.
     std::vector<FieldError> explain(const Row& row, const Json::Value& parameters) const;
 
 private:

@@ -1,4 +1,5 @@
-// What the host asks of the platform beside the contract: the one place where it knows which platform it runs on.
+// What the host asks of the platform beside the contract: the one place where it knows which platform it runs
+// on.
 //
 // May be called from any thread unless it says otherwise.
 #ifndef VELT_HOST_PLATFORM_ACCESS_H
@@ -52,12 +53,12 @@ struct PlatformReport {
     int port = 0;         ///< that port
 };
 
-/// Opens the platform's state below the root. Before any other call, while the process has one thread. False, with
-/// the reason in `error`, when that fails.
+/// Opens the platform's state below the root. Before any other call, while the process has one thread. False,
+/// with the reason in `error`, when that fails.
 bool openPlatform(const std::filesystem::path& stateRoot, std::string& error);
 
-/// Starts the services that the settings enable. False, with the reason in `error`, when one does not start; the
-/// others run.
+/// Starts the services that the settings enable. False, with the reason in `error`, when one does not start;
+/// the others run.
 bool startEnabledServices(std::string& error);
 
 /// Observes the platform until unobservePlatform, after which no observer is running.
@@ -70,8 +71,8 @@ void beginPlatformRequest(const std::string& actor, const std::string& address);
 /// This thread has served its request.
 PlatformReport endPlatformRequest();
 
-/// The newest entries of the administrator log that the query lets through, newest first. Nothing, with the reason
-/// in `error`, when the log cannot be read.
+/// The newest entries of the administrator log that the query lets through, newest first. Nothing, with the
+/// reason in `error`, when the log cannot be read.
 std::optional<std::vector<AdminLogEntry>> queryAdminLog(const AdminLogQuery& query, std::string& error);
 
 } // namespace velt::host

@@ -1,4 +1,5 @@
-// The order in which requests reach the modules: reads side by side, writes alone, in the order of their arrival.
+// The order in which requests reach the modules: reads side by side, writes alone, in the order of their
+// arrival.
 #ifndef VELT_HOST_REQUEST_ORDER_H
 #define VELT_HOST_REQUEST_ORDER_H
 
@@ -12,8 +13,9 @@
 
 namespace velt::host {
 
-/// A pool of threads. No read runs while a write runs, and no two writes run at once; a read that comes after a
-/// waiting write waits for it too, so that writes do not starve. No thread waits in a lock for another's turn.
+/// A pool of threads. No read runs while a write runs, and no two writes run at once; a read that comes after
+/// a waiting write waits for it too, so that writes do not starve. No thread waits in a lock for another's
+/// turn.
 class RequestOrder {
 public:
     enum class Kind {

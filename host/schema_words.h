@@ -9,8 +9,8 @@
 
 namespace velt::host {
 
-/// What the schema expects at the path of property names and array indices: "an integer from 1 to 65535", "true or
-/// false". "another value" when the schema does not say.
+/// What the schema expects at the path of property names and array indices: "an integer from 1 to 65535",
+/// "true or false". "another value" when the schema does not say.
 std::string expectationOf(const Json::Value& schema, const std::vector<std::string>& path);
 
 } // namespace velt::host

@@ -33,8 +33,8 @@ public:
     /// Reads the file; there need be none yet. Throws TokenError when it is damaged: access is never guessed.
     explicit TokenStore(std::filesystem::path file);
 
-    /// Makes a token with 256 random bits and returns it: the only time that it is seen. `created` gets what is stored
-    /// of it. Throws TokenError when it cannot be stored; there is no new token then.
+    /// Makes a token with 256 random bits and returns it: the only time that it is seen. `created` gets what
+    /// is stored of it. Throws TokenError when it cannot be stored; there is no new token then.
     std::string create(const std::string& name, Role role, Token& created);
 
     /// False when there is no such token. Throws TokenError when the change cannot be stored.

@@ -36,8 +36,8 @@ void Connection::enforceDeadline() {
     const State state = state_;
     if (state == State::idle || state == State::head || state == State::body) {
         tooSlow_ = state != State::idle;
-        // The reader wakes up, and answers if it has to; the deadline of its writing is the next. A request that was
-        // complete a moment ago is still answered.
+        // The reader wakes up, and answers if it has to; the deadline of its writing is the next. A request
+        // that was complete a moment ago is still answered.
         deadline_ = never;
         shutdown(descriptor(), SHUT_RD);
     } else {

@@ -12,7 +12,8 @@
 
 namespace velt::host {
 
-/// One connection. It closes its descriptor in its destructor only, so that others may shut it down meanwhile.
+/// One connection. It closes its descriptor in its destructor only, so that others may shut it down
+/// meanwhile.
 class Connection {
 public:
     enum class State {

@@ -20,12 +20,12 @@ public:
 /// A listening descriptor, closed at the end; a Unix socket's path is unlinked then if it was made here.
 class Listener {
 public:
-    /// An address such as "127.0.0.1:8080", "[::1]:0" or "localhost:8080"; port 0 takes a free one. Anything but loopback
-    /// is refused unless `allowRemote`. Throws ListenError.
+    /// An address such as "127.0.0.1:8080", "[::1]:0" or "localhost:8080"; port 0 takes a free one. Anything
+    /// but loopback is refused unless `allowRemote`. Throws ListenError.
     static Listener tcp(const std::string& address, bool allowRemote);
 
-    /// A Unix socket that its owner and the group (when there is such a group) can connect to. What a dead host
-    /// has left at the path is removed, a live one is not. Throws ListenError.
+    /// A Unix socket that its owner and the group (when there is such a group) can connect to. What a dead
+    /// host has left at the path is removed, a live one is not. Throws ListenError.
     static Listener unixSocket(const std::filesystem::path& path, const std::string& group);
 
     /// What the service manager hands over when it started this process by socket activation; usually none.

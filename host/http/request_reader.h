@@ -11,8 +11,8 @@
 
 namespace velt::host {
 
-/// The framing of one connection's requests, strict where leniency would let two readers disagree about where a
-/// request ends. Not thread-safe.
+/// The framing of one connection's requests, strict where leniency would let two readers disagree about where
+/// a request ends. Not thread-safe.
 class RequestReader {
 public:
     enum class Step {

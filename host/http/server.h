@@ -43,13 +43,14 @@ public:
     HttpServer(const HttpServer&) = delete;
     HttpServer& operator=(const HttpServer&) = delete;
 
-    /// To be called before start(). TCP listeners speak TLS when there is a certificate, Unix sockets never do.
+    /// To be called before start(). TCP listeners speak TLS when there is a certificate, Unix sockets never
+    /// do.
     void add(Listener listener);
 
     void start(unsigned threads);
 
-    /// Accepts no more, ends idle connections and streams of events at once, and waits until the requests that run are
-    /// answered, or until the time is over.
+    /// Accepts no more, ends idle connections and streams of events at once, and waits until the requests
+    /// that run are answered, or until the time is over.
     void stop(std::chrono::milliseconds patience);
 
     std::size_t connections() const;

@@ -194,8 +194,8 @@ private:
             });
     }
 
-    /// Ends the sending side, and throws away for a while what the client still sends: a reset would take the answer
-    /// from it.
+    /// Ends the sending side, and throws away for a while what the client still sends: a reset would take the
+    /// answer from it.
     void finish() {
         enter(State::draining, limits_.drainTime);
         if constexpr (isTls) {

@@ -6,8 +6,8 @@
 
 namespace velt {
 
-/// Waits until the descriptor has input or its other end is gone. False when the deadline passes first, and with an
-/// unusable descriptor. A signal that the process handles meanwhile does not end the wait.
+/// Waits until the descriptor has input or its other end is gone. False when the deadline passes first, and
+/// with an unusable descriptor. A signal that the process handles meanwhile does not end the wait.
 bool waitForInput(int descriptor, std::chrono::steady_clock::time_point deadline);
 
 } // namespace velt

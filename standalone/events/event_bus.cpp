@@ -14,8 +14,8 @@ namespace {
 
 std::atomic<Subscription> nextSubscription{1};
 
-/// A subscription keeps a lock of its own, held during its calls: ending it waits for a running call, and a subscriber
-/// that ends its own subscription, or causes a further message, does not wait for itself.
+/// A subscription keeps a lock of its own, held during its calls: ending it waits for a running call, and a
+/// subscriber that ends its own subscription, or causes a further message, does not wait for itself.
 template<class Message> class Subscribers {
 public:
     Subscription add(std::function<void(const Message&)> call) {

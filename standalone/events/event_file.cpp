@@ -38,8 +38,8 @@ int failToWrite(const std::filesystem::path& path, const char* why) {
     return fail(ErrorNumber::event, "The event cannot be written to " + path.string() + ": " + why + ".");
 }
 
-/// A line that does not fit on the disk is taken back, or the next one would be lost with it. The lock keeps other
-/// writers from adding theirs in between.
+/// A line that does not fit on the disk is taken back, or the next one would be lost with it. The lock keeps
+/// other writers from adding theirs in between.
 int writeLine(int fd, const std::string& line, const std::filesystem::path& path) {
     if (flock(fd, LOCK_EX) != 0) {
         return failToWrite(path, std::strerror(errno));

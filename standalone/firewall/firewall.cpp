@@ -21,8 +21,8 @@
 namespace velt {
 namespace {
 
-/// Stands while rules of ours are loaded, with the boot of the machine in which they were: below a state root other than "/"
-/// the file outlives a boot, the rules do not.
+/// Stands while rules of ours are loaded, with the boot of the machine in which they were: below a state root
+/// other than "/" the file outlives a boot, the rules do not.
 std::filesystem::path loadedMark() {
     return statePath("/run/velt/firewall.loaded");
 }
@@ -73,8 +73,8 @@ void warnOfForeignTables() {
     }
 }
 
-/// The rules belong to the machine, so an installation below another root leaves them alone unless it was told about a
-/// firewall: its defaults would take away what the machine's own installation drops.
+/// The rules belong to the machine, so an installation below another root leaves them alone unless it was
+/// told about a firewall: its defaults would take away what the machine's own installation drops.
 bool mayTouchRules() {
     std::error_code ignored;
     return statePath("/") == "/" || std::filesystem::exists(statePath("/etc/velt/firewall.conf"), ignored);
@@ -84,7 +84,8 @@ int loadRules() {
     if (!mayTouchRules()) {
         return 0;
     }
-    // Held until the rules are loaded: of two processes the one with the older settings must not load its rules last.
+    // Held until the rules are loaded: of two processes the one with the older settings must not load its
+    // rules last.
     const StateLock lock;
     const auto firewall = lock ? loadFirewallSettings() : std::nullopt;
     if (!firewall) {

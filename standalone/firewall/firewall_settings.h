@@ -28,13 +28,14 @@ struct FirewallSettings {
 ///     mode = drop
 ///     ports = 22 443 8000-8010
 ///
-/// `file` names it in errors. Nothing, with the last error naming file and line, when it does not have this form.
+/// `file` names it in errors. Nothing, with the last error naming file and line, when it does not have this
+/// form.
 std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, const std::string& file);
 
-/// The settings of /etc/velt/firewall.conf below the state root, the defaults where there is none. Nothing, with
-/// the last error set, when the file cannot be read or is damaged. The table belongs to the machine: an installation
-/// below a root other than "/" touches it only when that root has a file of its own, and takes its rules away again by
-/// the mode off, not by the removal of the file.
+/// The settings of /etc/velt/firewall.conf below the state root, the defaults where there is none. Nothing,
+/// with the last error set, when the file cannot be read or is damaged. The table belongs to the machine: an
+/// installation below a root other than "/" touches it only when that root has a file of its own, and takes
+/// its rules away again by the mode off, not by the removal of the file.
 std::optional<FirewallSettings> loadFirewallSettings();
 
 } // namespace velt

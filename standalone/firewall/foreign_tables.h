@@ -8,9 +8,9 @@
 
 namespace velt {
 
-/// From nft's list of chains in JSON: each input chain outside our table that drops what no rule of its own accepts, as
-/// "inet filter input". A packet must pass every chain, so our accept does not help there. Empty for a text that is not such
-/// a list.
+/// From nft's list of chains in JSON: each input chain outside our table that drops what no rule of its own
+/// accepts, as "inet filter input". A packet must pass every chain, so our accept does not help there. Empty
+/// for a text that is not such a list.
 std::vector<std::string> foreignDropChains(std::string_view chainsAsJson);
 
 } // namespace velt

@@ -20,12 +20,12 @@ struct KnownService {
 /// The list that is shipped, as the text of its file.
 extern const std::string_view shippedKnownServices;
 
-/// Reads such a text; `file` names it in errors. Nothing, with the last error naming file and line, when a line is neither a service, a
-/// comment, nor blank.
+/// Reads such a text; `file` names it in errors. Nothing, with the last error naming file and line, when a
+/// line is neither a service, a comment, nor blank.
 std::optional<std::vector<KnownService>> parseKnownServices(std::string_view text, const std::string& file);
 
-/// The administrator's list, /etc/velt/known_services.conf below the state root; the shipped one where there is none. Nothing,
-/// with the last error set, when it cannot be read.
+/// The administrator's list, /etc/velt/known_services.conf below the state root; the shipped one where there
+/// is none. Nothing, with the last error set, when it cannot be read.
 std::optional<std::vector<KnownService>> loadKnownServices();
 
 } // namespace velt

@@ -15,7 +15,8 @@ struct ListeningSocket {
     unsigned long inode = 0;
 };
 
-/// The listening TCP sockets, IPv4 and IPv6, of the network namespace in which the process `pid` lives; 0 is the caller.
+/// The listening TCP sockets, IPv4 and IPv6, of the network namespace in which the process `pid` lives; 0 is
+/// the caller.
 std::vector<ListeningSocket> listeningSockets(pid_t pid = 0);
 
 /// Whether the process itself holds a listening socket on the port.

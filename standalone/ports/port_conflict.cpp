@@ -86,7 +86,8 @@ std::optional<Conflict> conflictWithConfiguration(const Question& question, cons
     if (question.service != sftpService && question.holds(ports.sftp)) {
         return heldBy(ports.sftp, "the SFTP service");
     }
-    // A single port may be asked for by the FTP service since it is its control port; a range may not hold it.
+    // A single port may be asked for by the FTP service since it is its control port; a range may not hold
+    // it.
     if (!(question.service == ftpService && question.isOnePort()) && question.holds(ports.ftpControl)) {
         return heldBy(ports.ftpControl, "the control connections of the FTP service");
     }
@@ -140,8 +141,8 @@ std::vector<ProcessId> ownProcesses(const Question& question) {
 
 std::optional<Conflict> conflictWithListener(const Question& question, const ConfiguredPorts& ports) {
     std::vector<ListeningSocket> sockets = listeningSockets();
-    // A stored passive range may have a port less, since each session takes one that is free. A daemon's own port must be free,
-    // also when it is the stored one: the service may have been off.
+    // A stored passive range may have a port less, since each session takes one that is free. A daemon's own
+    // port must be free, also when it is the stored one: the service may have been off.
     const auto canDoWithout = [&](int port) {
         return !question.isOnePort() && isOwnPort(question, ports, port);
     };

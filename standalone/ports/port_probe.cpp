@@ -21,7 +21,8 @@ int bindTo(int family, const sockaddr* address, socklen_t size) {
         ::bind(socket.get(), address, size) != 0) {
         return errno;
     }
-    // A second socket may be bound beside a listening one in some combinations of addresses; only listening is proof.
+    // A second socket may be bound beside a listening one in some combinations of addresses; only listening
+    // is proof.
     return ::listen(socket.get(), 1) == 0 ? 0 : errno;
 }
 

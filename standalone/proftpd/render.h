@@ -16,8 +16,8 @@ struct AccountFiles {
     std::filesystem::path groups;
 };
 
-/// What the configuration needs to know beside the settings. All of it is made by the platform; none of it is text that
-/// reached the platform through a request.
+/// What the configuration needs to know beside the settings. All of it is made by the platform; none of it is
+/// text that reached the platform through a request.
 struct ProftpdPlaces {
     std::filesystem::path moduleFolder; ///< holds mod_velt_chroot.so
     std::filesystem::path runFolder;    ///< for the daemon's own run-time files
@@ -35,15 +35,16 @@ struct ProftpdPlaces {
     std::optional<AccountFiles> accountFiles; ///< absent: the server's users, through PAM
 };
 
-/// Whether the path can stand in the configuration: absolute, of at most 1024 bytes, and without the characters that mean
-/// something to the daemon even between quotes.
+/// Whether the path can stand in the configuration: absolute, of at most 1024 bytes, and without the
+/// characters that mean something to the daemon even between quotes.
 bool isRenderable(const std::filesystem::path& path);
 
-/// The whole configuration. The settings have passed checkFtpSettings, the places isRenderable. A pure function.
+/// The whole configuration. The settings have passed checkFtpSettings, the places isRenderable. A pure
+/// function.
 std::string renderProftpd(const FtpSettings& settings, const ProftpdPlaces& places);
 
-/// Whether local users without a rule see the shares under one root instead of their homes, or anonymous users
-/// do: the daemon then needs the share root.
+/// Whether local users without a rule see the shares under one root instead of their homes, or anonymous
+/// users do: the daemon then needs the share root.
 bool needsShareRoot(const FtpSettings& settings);
 
 } // namespace velt

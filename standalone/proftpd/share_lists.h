@@ -18,12 +18,12 @@ enum class AnonymousAccess {
     write,
 };
 
-/// The map that mod_velt_chroot consults at each login: a version line, then a line per share with its name and folder,
-/// separated by a tab.
+/// The map that mod_velt_chroot consults at each login: a version line, then a line per share with its name
+/// and folder, separated by a tab.
 std::string shareMapText(const std::vector<ShareEntry>& shares);
 
-/// The list that velt-share-root mounts: the shares offered to FTP below "users", and those that anonymous users can reach below
-/// "anonymous".
+/// The list that velt-share-root mounts: the shares offered to FTP below "users", and those that anonymous
+/// users can reach below "anonymous".
 std::string mountListText(const std::vector<ShareEntry>& shares,
                           const std::function<AnonymousAccess(const ShareEntry&)>& anonymousAccess);
 

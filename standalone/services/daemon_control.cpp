@@ -33,8 +33,8 @@ std::string nameOf(Daemon daemon) {
     return daemon == Daemon::ftp ? "ftpd" : "sftp";
 }
 
-/// One operation on a daemon at a time, over all threads and processes. Not the lock of the settings: a start may take
-/// seconds, in which settings can be read and written.
+/// One operation on a daemon at a time, over all threads and processes. Not the lock of the settings: a start
+/// may take seconds, in which settings can be read and written.
 class OperationLock {
 public:
     explicit OperationLock(Daemon daemon) {
@@ -88,8 +88,8 @@ NextStart nextStart(Daemon daemon, const ServiceState& now) {
     return {true, !serving || (portIsFree(settings->port) && testSftpCandidate(*settings) >= 0)};
 }
 
-/// After a start or a stop with this result: the rules open the ports of what is enabled, which may have changed although no
-/// port did. A daemon that did what was asked of it has not failed because of them.
+/// After a start or a stop with this result: the rules open the ports of what is enabled, which may have
+/// changed although no port did. A daemon that did what was asked of it has not failed because of them.
 int followedByFirewall(int result) {
     if (result >= 0 && VELTFwRuleHup() < 0) {
         ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());

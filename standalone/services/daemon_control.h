@@ -17,16 +17,18 @@ enum class Daemon {
 /// The daemon behind a service name; nothing, with the last error set, for a name that is none of ours.
 std::optional<Daemon> daemonOf(const char* service);
 
-/// Makes the daemon run with the stored settings; the FTP daemon is stopped where they enable neither FTP nor FTPS. After a
-/// start, and after a stop that no start follows, the firewall's rules are loaded anew; that these cannot be is no failure,
-/// it goes to syslog. Like the following: negative on failure, with the last error set; safe from all threads and processes.
+/// Makes the daemon run with the stored settings; the FTP daemon is stopped where they enable neither FTP nor
+/// FTPS. After a start, and after a stop that no start follows, the firewall's rules are loaded anew; that
+/// these cannot be is no failure, it goes to syslog. Like the following: negative on failure, with the last
+/// error set; safe from all threads and processes.
 int startDaemon(Daemon daemon);
 
 /// Ends the daemon and its sessions.
 int stopDaemon(Daemon daemon);
 
-/// The same as the first half of a restart: refused, so that the former daemon serves on, when the ports of the stored settings are
-/// held by another program, or when the daemon's own test refuses their configuration.
+/// The same as the first half of a restart: refused, so that the former daemon serves on, when the ports of
+/// the stored settings are held by another program, or when the daemon's own test refuses their
+/// configuration.
 int stopDaemonForRestart(Daemon daemon);
 
 /// Ends the listener only.

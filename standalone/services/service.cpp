@@ -65,7 +65,8 @@ int startEnabledServices() {
         if (!ftp || !sftp) {
             return -1;
         }
-        // The firewall's rules went with the boot as well. Rules that miss do not keep the services down, just as they do not when a port changes.
+        // The firewall's rules went with the boot as well. Rules that miss do not keep the services down,
+        // just as they do not when a port changes.
         if (VELTFwRuleHup() < 0) {
             ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
         }
@@ -89,8 +90,8 @@ ServiceState serviceState(const std::string& service) {
 
 extern "C" {
 
-// An unknown service, and settings that cannot be read, are answered with 0 and not with a negative number, which would read as
-// enabled.
+// An unknown service, and settings that cannot be read, are answered with 0 and not with a negative number,
+// which would read as enabled.
 int VLIBServiceIsEnabled(const char* service) {
     const int enabled = velt::atBoundary([service] {
         const auto daemon = velt::daemonOf(service);

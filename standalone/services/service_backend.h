@@ -10,14 +10,15 @@
 
 namespace velt {
 
-/// Runs one daemon. Every operation returns a negative number on failure, with the last error set. Operations that change
-/// something come one at a time; state() may be asked any time.
+/// Runs one daemon. Every operation returns a negative number on failure, with the last error set. Operations
+/// that change something come one at a time; state() may be asked any time.
 class ServiceBackend {
 public:
     virtual ~ServiceBackend() = default;
 
-    /// Makes the daemon run as planned. Does nothing when one with the same configuration serves already; otherwise probes the
-    /// ports, ends the listener that runs, and returns when the new one listens, or within 5 s with the daemon's reason.
+    /// Makes the daemon run as planned. Does nothing when one with the same configuration serves already;
+    /// otherwise probes the ports, ends the listener that runs, and returns when the new one listens, or
+    /// within 5 s with the daemon's reason.
     virtual int start(const DaemonPlan& plan) = 0;
 
     /// Ends the listener only, and waits for its end. One that does not run is no failure.
@@ -32,8 +33,8 @@ public:
 /// The backend for the daemon "ftpd" or "sftp" on this machine.
 std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon);
 
-/// The folder of the files about running daemons, which is made when it is missing; empty, with the last error set, when
-/// it cannot be made.
+/// The folder of the files about running daemons, which is made when it is missing; empty, with the last
+/// error set, when it cannot be made.
 std::filesystem::path runDirectory();
 
 /// "The FTP daemon", "The SFTP daemon": how sentences begin.

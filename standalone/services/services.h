@@ -8,8 +8,8 @@
 
 namespace velt {
 
-/// What runs of the service: "ftpd", "ftpd-pure" and "ftpd-ssl" are one daemon, "sftp" is the other. Stopped for an unknown
-/// name.
+/// What runs of the service: "ftpd", "ftpd-pure" and "ftpd-ssl" are one daemon, "sftp" is the other. Stopped
+/// for an unknown name.
 ServiceState serviceState(const std::string& service);
 
 } // namespace velt

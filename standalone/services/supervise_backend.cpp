@@ -24,8 +24,8 @@ namespace {
 
 using std::chrono::milliseconds;
 
-// A start is promised to be over within five seconds, of which the supervisor allows itself a little less. An end that takes
-// longer than this is taken out of the supervisor's hands.
+// A start is promised to be over within five seconds, of which the supervisor allows itself a little less. An
+// end that takes longer than this is taken out of the supervisor's hands.
 constexpr milliseconds startLimit{4900};
 constexpr milliseconds endLimit{6000};
 constexpr int reportDescriptor = 3;
@@ -38,8 +38,8 @@ std::string joinPorts(const std::vector<int>& ports) {
     return text;
 }
 
-/// Starts the program with `report` as its descriptor 3 and waits for its end, which comes at once: it goes on in a child of
-/// its own. 0, or an errno.
+/// Starts the program with `report` as its descriptor 3 and waits for its end, which comes at once: it goes
+/// on in a child of its own. 0, or an errno.
 int spawnDetached(std::vector<std::string> arguments, int report) {
     std::vector<char*> pointers;
     for (std::string& argument : arguments) {
@@ -162,8 +162,8 @@ int SuperviseBackend::pause() {
         return fail(ErrorNumber::daemon, daemonTitle(daemon_) + " cannot be paused: " +
                                              answer.value_or("its supervisor does not answer") + ".");
     }
-    // Without a supervisor nobody could end the sessions later, once their listener is gone and no longer shows which
-    // are its own.
+    // Without a supervisor nobody could end the sessions later, once their listener is gone and no longer
+    // shows which are its own.
     return stop();
 }
 

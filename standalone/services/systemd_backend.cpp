@@ -144,8 +144,8 @@ int SystemdBackend::stop() {
 
 std::vector<ProcessId> SystemdBackend::unitProcesses(const std::string& controlGroup) const {
     std::vector<ProcessId> processes;
-    // The group is looked for by the unit's own place as well: after a pause systemd has forgotten it, while the
-    // sessions are still in it.
+    // The group is looked for by the unit's own place as well: after a pause systemd has forgotten it, while
+    // the sessions are still in it.
     const std::string path = controlGroup.empty() ? "/system.slice/" + unitName(daemon_) : controlGroup;
     for (const std::string& hierarchy : {std::string(), std::string("/systemd"), std::string("/unified")}) {
         std::ifstream members(places_.cgroups.string() + hierarchy + path + "/cgroup.procs");

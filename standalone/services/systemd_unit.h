@@ -12,7 +12,8 @@ namespace velt {
 /// "velt-ftpd.service" for the daemon "ftpd".
 std::string unitName(const std::string& daemon);
 
-/// The unit's text. It also carries the plan's configuration hash and ports, in a section that systemd leaves alone.
+/// The unit's text. It also carries the plan's configuration hash and ports, in a section that systemd leaves
+/// alone.
 std::string renderUnit(const std::string& daemon, const DaemonPlan& plan);
 
 /// What a unit's text says about the plan that it was made from; the arguments stay empty.

@@ -6,8 +6,9 @@
 
 namespace velt {
 
-/// Passes the configuration that would follow from these settings through the daemon's own test. Nothing that a running daemon
-/// uses is touched. Negative when it is refused, with the daemon's own words in the last error's sentence.
+/// Passes the configuration that would follow from these settings through the daemon's own test. Nothing that
+/// a running daemon uses is touched. Negative when it is refused, with the daemon's own words in the last
+/// error's sentence.
 int testFtpCandidate(const FtpSettings& settings);
 int testSftpCandidate(const SftpSettings& settings);
 

@@ -21,7 +21,8 @@ namespace {
 // The daemon starts itself anew for each connection and needs its absolute path for that.
 constexpr const char* program = "/usr/sbin/sshd";
 
-// The daemon has this place built in, so it does not follow the state root; nothing but its being there counts.
+// The daemon has this place built in, so it does not follow the state root; nothing but its being there
+// counts.
 int makeSeparationFolder() {
     if (geteuid() != 0 || mkdir("/run/sshd", 0755) == 0 || errno == EEXIST) {
         return 0;

@@ -26,8 +26,8 @@ constexpr std::array<std::pair<Command, std::string_view>, 3> commandNames{{
     {Command::stop, "stop"},
 }};
 
-/// The socket's address by way of the folder's descriptor: a state root may lie deeper than the 107 bytes that an
-/// address has room for.
+/// The socket's address by way of the folder's descriptor: a state root may lie deeper than the 107 bytes
+/// that an address has room for.
 class SocketAddress {
 public:
     SocketAddress(const std::filesystem::path& directory, const std::string& service)

@@ -47,8 +47,8 @@ private:
     int descriptor_ = -1;
 };
 
-/// Sends the request to the service's supervisor and waits for its answer: "" on success, else the reason. Nothing when no
-/// supervisor answers in time.
+/// Sends the request to the service's supervisor and waits for its answer: "" on success, else the reason.
+/// Nothing when no supervisor answers in time.
 std::optional<std::string> askSupervisor(const std::filesystem::path& directory, const std::string& service,
                                          const ControlRequest& request, std::chrono::milliseconds limit);
 

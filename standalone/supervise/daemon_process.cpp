@@ -31,7 +31,8 @@ public:
         posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
         posix_spawn_file_actions_adddup2(&actions, output, STDOUT_FILENO);
         posix_spawn_file_actions_adddup2(&actions, output, STDERR_FILENO);
-        // The supervisor blocks the signals that it reads from a descriptor; the daemon must not inherit that.
+        // The supervisor blocks the signals that it reads from a descriptor; the daemon must not inherit
+        // that.
         posix_spawnattr_init(&attributes);
         sigset_t none;
         sigemptyset(&none);

@@ -29,8 +29,8 @@ public:
     DaemonProcess(const DaemonProcess&) = delete;
     DaemonProcess& operator=(const DaemonProcess&) = delete;
 
-    /// Starts the daemon and waits until it listens. "" when it does; else why it does not, in the daemon's own words where it has
-    /// some, and it is gone. All that it writes goes to syslog.
+    /// Starts the daemon and waits until it listens. "" when it does; else why it does not, in the daemon's
+    /// own words where it has some, and it is gone. All that it writes goes to syslog.
     std::string start(const DaemonOrder& order, Clock::time_point deadline);
 
     /// The running daemon; no process before a start and after ended().

@@ -6,8 +6,8 @@
 
 namespace velt {
 
-/// The one line of what a daemon wrote to its standard error that explains its end best, without time, process, host and full
-/// stop; "" when it wrote nothing.
+/// The one line of what a daemon wrote to its standard error that explains its end best, without time,
+/// process, host and full stop; "" when it wrote nothing.
 std::string lastWords(const std::string& errors);
 
 } // namespace velt

@@ -2,8 +2,8 @@
 //
 //     velt-supervise DIRECTORY SERVICE CONFIGURATION PORTS PROGRAM [ARGUMENT...]
 //
-// DIRECTORY holds the state file, the lock and the control socket; PORTS are separated by commas; CONFIGURATION
-// identifies what the daemon is started for. The process that was started ends at once; its
+// DIRECTORY holds the state file, the lock and the control socket; PORTS are separated by commas;
+// CONFIGURATION identifies what the daemon is started for. The process that was started ends at once; its
 // child goes on and writes "ready", or "failed" and the reason, to descriptor 3.
 
 #include "standalone/supervise/supervisor.h"
@@ -98,7 +98,8 @@ int main(int argc, char** argv) {
         return 2;
     }
     velt::DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
-    // What the daemons write goes there as well, the reasons of refused logins among it, so it is under their names.
+    // What the daemons write goes there as well, the reasons of refused logins among it, so it is under their
+    // names.
     const std::string ident =
         std::string_view(argv[2]) == "sftp" ? "velt-sftpd" : std::string("velt-") + argv[2];
     ::openlog(ident.c_str(), LOG_PID, LOG_DAEMON);

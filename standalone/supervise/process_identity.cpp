@@ -116,8 +116,8 @@ void signalProcess(const ProcessId& process, int signal) {
     if (!process) {
         return;
     }
-    // The descriptor stands for one process for ever. What is compared after it was opened is therefore what the
-    // signal reaches, even when the pid changes hands meanwhile.
+    // The descriptor stands for one process for ever. What is compared after it was opened is therefore what
+    // the signal reaches, even when the pid changes hands meanwhile.
     const int descriptor = static_cast<int>(::syscall(SYS_pidfd_open, process.pid, 0));
     if (descriptor < 0) {
         return;

@@ -1,5 +1,5 @@
-// Processes told apart by pid and start time, so that a pid that the kernel has given to another process is never
-// taken for the one that is meant.
+// Processes told apart by pid and start time, so that a pid that the kernel has given to another process is
+// never taken for the one that is meant.
 #ifndef VELT_STANDALONE_SUPERVISE_PROCESS_IDENTITY_H
 #define VELT_STANDALONE_SUPERVISE_PROCESS_IDENTITY_H
 
@@ -21,8 +21,8 @@ struct ProcessId {
     bool operator==(const ProcessId&) const = default;
 };
 
-/// What tells this boot of the machine from every other. A process is named by its ProcessId within one boot only, so files that
-/// may outlive it note this beside one.
+/// What tells this boot of the machine from every other. A process is named by its ProcessId within one boot
+/// only, so files that may outlive it note this beside one.
 std::string bootId();
 
 /// The process that has this pid now; nothing when there is none or it has ended and only waits to be reaped.
@@ -40,8 +40,8 @@ std::vector<ProcessId> descendantsOf(pid_t ancestor);
 /// The processes of the list that still run, and all that descend from these.
 std::vector<ProcessId> livingTrees(const std::vector<ProcessId>& roots);
 
-/// Ends all processes that `remaining` lists, which is asked again and again until it lists none: SIGTERM first, SIGKILL
-/// when `patience` has passed. False when some are there even a second after that.
+/// Ends all processes that `remaining` lists, which is asked again and again until it lists none: SIGTERM
+/// first, SIGKILL when `patience` has passed. False when some are there even a second after that.
 bool endProcesses(const std::function<std::vector<ProcessId>()>& remaining,
                   std::chrono::milliseconds patience);
 

@@ -32,8 +32,8 @@ struct ServiceState {
 std::filesystem::path stateFile(const std::filesystem::path& directory, const std::string& service);
 std::filesystem::path lockFile(const std::filesystem::path& directory, const std::string& service);
 
-/// Nothing when there is no such file, not one of this form, or one from before the machine started: its processes are gone,
-/// and others may have their numbers.
+/// Nothing when there is no such file, not one of this form, or one from before the machine started: its
+/// processes are gone, and others may have their numbers.
 std::optional<ServiceState> readServiceState(const std::filesystem::path& file);
 
 /// Replaces the file; it is whole at every moment. False on failure, errno says why.

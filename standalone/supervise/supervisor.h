@@ -14,8 +14,9 @@
 
 namespace velt {
 
-/// The life of the process velt-supervise: it starts the daemon, starts it again when it ends unasked, obeys the
-/// control socket and SIGTERM, inherits the sessions that outlive their listener, and keeps the state file.
+/// The life of the process velt-supervise: it starts the daemon, starts it again when it ends unasked, obeys
+/// the control socket and SIGTERM, inherits the sessions that outlive their listener, and keeps the state
+/// file.
 class Supervisor {
 public:
     Supervisor(std::filesystem::path directory, std::string service);
@@ -23,8 +24,8 @@ public:
     Supervisor(const Supervisor&) = delete;
     Supervisor& operator=(const Supervisor&) = delete;
 
-    /// Becomes the service's only supervisor, ends what a former one left, and starts the daemon: "" on success,
-    /// else the reason in one line, and nothing runs.
+    /// Becomes the service's only supervisor, ends what a former one left, and starts the daemon: "" on
+    /// success, else the reason in one line, and nothing runs.
     std::string begin(const DaemonOrder& order);
 
     /// Returns when the service was stopped.

@@ -1,4 +1,5 @@
-// The server's side of the API, with settings that can be read and changed, and scripted answers where a test wants them.
+// The server's side of the API, with settings that can be read and changed, and scripted answers where a test
+// wants them.
 #ifndef VELT_TESTS_CLI_FAKE_HOST_H
 #define VELT_TESTS_CLI_FAKE_HOST_H
 

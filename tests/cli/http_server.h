@@ -27,7 +27,8 @@ class HttpServer {
 public:
     using Handler = std::function<HttpReply(const HttpRequest&)>;
 
-    /// Listens on a free TCP port of the loopback and on the Unix socket at `socketPath`; answers on a thread of its own.
+    /// Listens on a free TCP port of the loopback and on the Unix socket at `socketPath`; answers on a thread
+    /// of its own.
     HttpServer(std::string socketPath, Handler handler);
     ~HttpServer();
     HttpServer(const HttpServer&) = delete;

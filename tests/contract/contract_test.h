@@ -1,5 +1,5 @@
-// The frame of the contract tests: one small world, and an owner of a list. These tests and this file know the contract
-// alone, so that they say the same of every platform.
+// The frame of the contract tests: one small world, and an owner of a list. These tests and this file know
+// the contract alone, so that they say the same of every platform.
 #ifndef VELT_TESTS_CONTRACT_CONTRACT_TEST_H
 #define VELT_TESTS_CONTRACT_CONTRACT_TEST_H
 
@@ -33,9 +33,9 @@ private:
     VLIBCSzList* list_;
 };
 
-/// Users ann (1000, "Ann Example"), ben (1001, no description) and bea (1002, "Bea"), the system account ftp (200);
-/// groups users (100) and staff (50); shares photos (offered to FTP, reached by "ftp"), private (offered, not
-/// reached) and hidden (not offered).
+/// Users ann (1000, "Ann Example"), ben (1001, no description) and bea (1002, "Bea"), the system account ftp
+/// (200); groups users (100) and staff (50); shares photos (offered to FTP, reached by "ftp"), private
+/// (offered, not reached) and hidden (not offered).
 class ContractTest : public ::testing::Test {
 protected:
     void SetUp() override;

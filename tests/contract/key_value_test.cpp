@@ -13,7 +13,8 @@ constexpr const char* infoFile = "/etc/veltinfo.conf";
 
 class KeyValueContract : public ContractTest {
 protected:
-    /// The key's value in the system information file, in a buffer of `size` bytes; nothing when there is no such key.
+    /// The key's value in the system information file, in a buffer of `size` bytes; nothing when there is no
+    /// such key.
     static std::optional<std::string> read(const char* key, int size = 64) {
         std::array<char, 64> buffer;
         buffer.fill('?');

@@ -1,5 +1,5 @@
-// What a contract test needs of a platform besides the contract: a world to ask about. Each platform that the suite is
-// linked with defines these functions.
+// What a contract test needs of a platform besides the contract: a world to ask about. Each platform that the
+// suite is linked with defines these functions.
 #ifndef VELT_TESTS_CONTRACT_PLATFORM_SETUP_H
 #define VELT_TESTS_CONTRACT_PLATFORM_SETUP_H
 
@@ -41,7 +41,8 @@ struct World {
 /// std::runtime_error when the platform cannot be prepared.
 void prepare(const World& world);
 
-/// Ends what prepare began; adds a test failure for every handle that was not freed, as far as the platform counts them.
+/// Ends what prepare began; adds a test failure for every handle that was not freed, as far as the platform
+/// counts them.
 void finish();
 
 /// The folder of a share of the prepared world.

@@ -1,5 +1,5 @@
-// The platform of an ordinary server below a temporary state root. No daemon is started; the daemons' own tests of a
-// configuration are the real ones.
+// The platform of an ordinary server below a temporary state root. No daemon is started; the daemons' own
+// tests of a configuration are the real ones.
 #include "standalone/accounts/account_sources.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"

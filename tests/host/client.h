@@ -43,7 +43,8 @@ public:
     /// send and receive.
     Answer ask(const std::string& text);
 
-    /// Reads until the text was seen; returns all that came before it and itself, or "" when it does not come.
+    /// Reads until the text was seen; returns all that came before it and itself, or "" when it does not
+    /// come.
     std::string readUntil(const std::string& text);
 
     /// Whether the other side has ended the connection.
@@ -56,7 +57,8 @@ private:
     std::string buffer_;
 };
 
-/// "METHOD target HTTP/1.1", Host, the header lines given (each with its line end), and the body with its length.
+/// "METHOD target HTTP/1.1", Host, the header lines given (each with its line end), and the body with its
+/// length.
 std::string requestText(const std::string& method, const std::string& target, const std::string& headers = "",
                         const std::string& body = "");
 

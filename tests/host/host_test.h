@@ -1,4 +1,5 @@
-// The frame of a test of the host: the real HTTP server on a free port and a Unix socket, over the module in MODULE_PATH.
+// The frame of a test of the host: the real HTTP server on a free port and a Unix socket, over the module in
+// MODULE_PATH.
 #ifndef VELT_TESTS_HOST_HOST_TEST_H
 #define VELT_TESTS_HOST_HOST_TEST_H
 

@@ -143,7 +143,8 @@ TEST_F(OpenApiTest, ProblemsAreAsDescribed) {
     EXPECT_EQ(violation(schema, ask("GET", "/api").json()), "");
 }
 
-/// Where the module says 1901, the description says what is wrong; where it accepts, the description does too.
+/// Where the module says 1901, the description says what is wrong; where it accepts, the description does
+/// too.
 TEST_F(OpenApiTest, TheDescriptionAgreesWithTheModuleOnEveryParameter) {
     const std::map<std::string, std::string> required{{"set", R"({"enable_ftp":true,"enable_ftps":true})"},
                                                       {"list", R"({"chroot":true})"}};
@@ -170,7 +171,8 @@ TEST_F(OpenApiTest, TheDescriptionAgreesWithTheModuleOnEveryParameter) {
                 const Answer answer = post(path, velt::host::toJson(parameters));
                 const bool says = answer.status == 422;
                 (says ? refused : accepted) += 1;
-                // Rules that are no list the module takes for none, which is not what it is described to take.
+                // Rules that are no list the module takes for none, which is not what it is described to
+                // take.
                 if (answer.status != 500 && row->method != "save") {
                     EXPECT_EQ(says, !description.explain(*row, parameters).empty())
                         << path << " " << velt::host::toJson(parameters) << " " << answer.body;

@@ -48,8 +48,8 @@ protected:
         makeCertificate(tls);
     }
 
-    /// What the server answers over TLS of the given versions, to its end or to the last text wanted; "" when there is
-    /// no handshake.
+    /// What the server answers over TLS of the given versions, to its end or to the last text wanted; "" when
+    /// there is no handshake.
     std::string askOverTls(const std::string& request, int lowest, int highest,
                            const std::string& last = "\r\n\r\nnever") const {
         const Owner<SSL_CTX> context(SSL_CTX_new(TLS_client_method()), SSL_CTX_free);

@@ -97,5 +97,21 @@ TEST_F(ModuleFirewall, followsThePortsOfBothServices) {
     EXPECT_TRUE(network.neighbourReaches(2223));
 }
 
+TEST_F(ModuleFirewall, followsAServiceThatIsSwitchedOnAtItsFormerPort) {
+    const PrivateNetwork network;
+    ASSERT_TRUE(network.isThere());
+    ASSERT_EQ(setFtp().code, 0);
+    ASSERT_EQ(setFtp(R"({"enable_ftp": false})").code, 0);
+    EXPECT_EQ(openPorts(), "");
+    ASSERT_EQ(setSftp(R"({"enable": false, "portnum": 2222})").code, 0);
+    ASSERT_EQ(setFtp().code, 0);
+    ASSERT_EQ(setSftp(R"({"enable": true})").code, 0);
+    EXPECT_EQ(openPorts(), "2121,2222,55536-55899");
+    EXPECT_TRUE(network.neighbourReaches(port));
+    EXPECT_TRUE(network.neighbourReaches(2222));
+    ASSERT_EQ(setSftp(R"({"enable": false})").code, 0);
+    EXPECT_EQ(openPorts(), "2121,55536-55899");
+}
+
 } // namespace
 } // namespace velt::test

@@ -32,7 +32,8 @@ protected:
         writeFile("/mnt/home/alice/large", std::string(size, 'x'), aliceId);
     }
 
-    /// An SFTP session of alice that does the commands; its speed in Kbit/s. The limit holds between two requests of 32 KiB.
+    /// An SFTP session of alice that does the commands; its speed in Kbit/s. The limit holds between two
+    /// requests of 32 KiB.
     static ProcessResult sftp(int atPort, const std::string& commands, const std::string& speed = "1000000") {
         return runProcess({"sftp",
                            "-F",

@@ -6,8 +6,8 @@
 
 namespace velt::test {
 
-/// Moves this process into a network namespace, and lets a child in a namespace of its own be the host at the other end of a
-/// cable: here is 192.0.2.1, there 192.0.2.2. Both namespaces end with their processes.
+/// Moves this process into a network namespace, and lets a child in a namespace of its own be the host at the
+/// other end of a cable: here is 192.0.2.1, there 192.0.2.2. Both namespaces end with their processes.
 class PrivateNetwork {
 public:
     PrivateNetwork();

@@ -1,5 +1,5 @@
-// The backend for systemd: its units as text, and its conversation with systemctl. The program that answers here is a
-// stand-in; that the real one understands the units shows only where systemd runs.
+// The backend for systemd: its units as text, and its conversation with systemctl. The program that answers
+// here is a stand-in; that the real one understands the units shows only where systemd runs.
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"

@@ -42,7 +42,8 @@ int connectTo(int port) {
 } // namespace
 
 int freePort() {
-    // Tests run side by side, so each process begins its search elsewhere. In wide steps, for tests that ask about ranges.
+    // Tests run side by side, so each process begins its search elsewhere. In wide steps, for tests that ask
+    // about ranges.
     static int next = (::getpid() * 370) % 10000;
     for (;;) {
         next = (next + 20) % 10000;

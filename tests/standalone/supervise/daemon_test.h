@@ -53,8 +53,8 @@ private:
 /// The plan that starts the test daemon on this port.
 DaemonPlan testPlan(int port, const std::string& hash, const std::vector<std::string>& options = {});
 
-/// A state root of the test's own, and the promise that no process outlives the test: whatever detached itself
-/// is inherited, and its being there is a failure.
+/// A state root of the test's own, and the promise that no process outlives the test: whatever detached
+/// itself is inherited, and its being there is a failure.
 class DaemonTest : public testing::Test {
 protected:
     void SetUp() override;

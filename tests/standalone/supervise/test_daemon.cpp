@@ -2,8 +2,9 @@
 //
 //     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--live MS] [--stubborn] [--any]
 //
-// It listens on loopback, with --any on all addresses; each connection is served by a session in a process and a terminal session of its own, which answers
-// every byte with the same byte and ends with its connection, or with a SIGTERM.
+// It listens on loopback, with --any on all addresses; each connection is served by a session in a process
+// and a terminal session of its own, which answers every byte with the same byte and ends with its
+// connection, or with a SIGTERM.
 
 #include <arpa/inet.h>
 #include <netinet/in.h>

@@ -12,8 +12,8 @@
 
 namespace velt::test {
 
-/// Expects the file to hold the text. With VELT_UPDATE_GOLDEN in the environment it writes the file instead, for a person to
-/// look through; the test then fails, so that such a run cannot count.
+/// Expects the file to hold the text. With VELT_UPDATE_GOLDEN in the environment it writes the file instead,
+/// for a person to look through; the test then fails, so that such a run cannot count.
 inline void expectGolden(const std::filesystem::path& file, const std::string& text) {
     if (std::getenv("VELT_UPDATE_GOLDEN") != nullptr) {
         std::ofstream(file, std::ios::binary | std::ios::trunc) << text;

@@ -74,12 +74,12 @@ struct State {
     std::optional<std::string> extIp;
     /// The other keys of that file. No other file exists: reading from one fails.
     std::map<std::string, std::string> infoKeys;
-    /// What a test sets stays. Where it set no number, a look-up of a share, user, group or rule that finds nothing
-    /// sets one.
+    /// What a test sets stays. Where it set no number, a look-up of a share, user, group or rule that finds
+    /// nothing sets one.
     LastError lastError;
 
-    /// What VLIBServiceIsEnabled answers, 0 for a service not named. A run key of 1 and VLIBServiceStart set 1, a run
-    /// key of 2 and VLIBServiceStop set 0; VELTFTPConfSet and VELTSFTPConfigSet set what they store.
+    /// What VLIBServiceIsEnabled answers, 0 for a service not named. A run key of 1 and VLIBServiceStart set
+    /// 1, a run key of 2 and VLIBServiceStop set 0; VELTFTPConfSet and VELTSFTPConfigSet set what they store.
     std::map<std::string, int> services;
     std::map<std::string, int> runKeys;
     std::set<std::string> running; ///< what was started and not stopped
@@ -104,7 +104,8 @@ struct State {
     /// Ports by the service that holds them. A conflict is a port of the range that a service other
     /// than the asking one holds, here or in storedPorts.
     std::map<std::string, std::set<int>> takenPorts;
-    /// The same for "ftp" and "ssh", as VELTFTPConfSet and VELTSFTPConfigSet stored their ports; nothing before.
+    /// The same for "ftp" and "ssh", as VELTFTPConfSet and VELTSFTPConfigSet stored their ports; nothing
+    /// before.
     std::map<std::string, std::vector<VELT_FTP_PORT_RANGE>> storedPorts;
 
     bool journalListGets = false; ///< VLIBCSzListGet

@@ -15,7 +15,8 @@ public:
     DaemonProcess(const DaemonProcess&) = delete;
     DaemonProcess& operator=(const DaemonProcess&) = delete;
 
-    /// Starts the daemon and waits until it listens; false, with the daemon's own output shown, when it does not.
+    /// Starts the daemon and waits until it listens; false, with the daemon's own output shown, when it does
+    /// not.
     bool start(const DaemonPlan& plan);
 
     /// Ends the daemon and waits for its end.

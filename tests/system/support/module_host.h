@@ -18,8 +18,8 @@ struct ModuleAnswer {
 inline constexpr const char* requestActorName = "tester";
 inline constexpr const char* requestActorAddress = "192.0.2.50";
 
-/// Serves one request by the row of the module's table that has this API, version and method; the module is loaded at the
-/// first one. Throws std::runtime_error when it cannot be loaded or has no such row.
+/// Serves one request by the row of the module's table that has this API, version and method; the module is
+/// loaded at the first one. Throws std::runtime_error when it cannot be loaded or has no such row.
 ModuleAnswer requestModule(const std::string& api, int version, const std::string& method,
                            const Json::Value& parameters);
 

@@ -26,7 +26,8 @@ protected:
     static constexpr int portConflict = 1903;
     static constexpr int rangeConflict = 1904;
 
-    /// The platform's defaults in a fresh state root, but for users who are confined to their homes: both services are off.
+    /// The platform's defaults in a fresh state root, but for users who are confined to their homes: both
+    /// services are off.
     void SetUp() override;
     /// Switches both services off through the module. No process, mount or listening port may be left then.
     void TearDown() override;
@@ -40,8 +41,8 @@ protected:
     static Json::Value getSftp();
     static Json::Value json(const std::string& text);
 
-    /// Writes the file of the shares: "public" (anonymous users read it), "music", "upload" (they write) and "closed", each a folder
-    /// of that name below /mnt/srv with one file "about" that holds the name.
+    /// Writes the file of the shares: "public" (anonymous users read it), "music", "upload" (they write) and
+    /// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name.
     static void makeShares();
 
     /// What alice gets when she fetches the file of her home; "" when she is refused.

@@ -110,7 +110,8 @@ bool enterPrivateWorld(int& exitCode) {
         reason = std::string("no name spaces can be made: ") + std::strerror(errno);
         return true;
     }
-    // The child is the first process of its name space: whatever it started ends with it, and it ends with us.
+    // The child is the first process of its name space: whatever it started ends with it, and it ends with
+    // us.
     const pid_t child = fork();
     if (child == 0) {
         prctl(PR_SET_PDEATHSIG, SIGKILL);

@@ -7,9 +7,9 @@
 
 namespace velt::test {
 
-/// Enters the world in a child process and returns true there. In the calling process it returns false once the child has
-/// ended, whose exit code it stores. Where the machine does not allow it, it returns true in the calling process itself
-/// and whyNoWorld says why.
+/// Enters the world in a child process and returns true there. In the calling process it returns false once
+/// the child has ended, whose exit code it stores. Where the machine does not allow it, it returns true in
+/// the calling process itself and whyNoWorld says why.
 bool enterPrivateWorld(int& exitCode);
 
 /// "" in the private world.
@@ -18,7 +18,8 @@ const std::string& whyNoWorld();
 /// The state root of the tests, on a file system that ends with the world.
 inline const std::filesystem::path worldRoot = "/mnt/root";
 
-// The accounts of the world; each one's password is its name followed by "-secret". The homes are below /mnt/home.
+// The accounts of the world; each one's password is its name followed by "-secret". The homes are below
+// /mnt/home.
 inline constexpr unsigned aliceId = 1001; // member of "staff"
 inline constexpr unsigned bobId = 1002;   // member of "staff"
 inline constexpr unsigned carolId = 1003;
