@@ -55,6 +55,10 @@ std::optional<DaemonPlan> planSftpDaemon() {
                     : std::nullopt;
 }
 
+int refreshShareMap() {
+    return 0;
+}
+
 int testFtpCandidate(const FtpSettings&) {
     return test::refuseIfAsked();
 }
