@@ -70,12 +70,12 @@ TEST_F(ModuleFailure, namesTheProgramThatHasThePort) {
     EXPECT_EQ(fetchHome(), "alice");
 }
 
-TEST_F(ModuleFailure, saysWhyTheServiceDoesNotStart) {
+TEST_F(ModuleFailure, refusesItsOwnPortWhileAStrangerHoldsIt) {
     ASSERT_EQ(setFtp(R"({"enable_ftp": false})").code, 0);
     const UniqueFd other = listenOn(port);
     const ModuleAnswer answer = setFtp();
-    EXPECT_EQ(answer.code, operationFailed);
-    EXPECT_TRUE(contains(answer.sentence, "Port 2121 is in use by ")) << answer.sentence;
+    EXPECT_EQ(answer.code, portConflict);
+    EXPECT_TRUE(contains(answer.sentence, "Port 2121 is taken by ")) << answer.sentence;
     EXPECT_EQ(logSentences(), std::vector<std::string>{}) << "nothing was switched on";
 }
 
