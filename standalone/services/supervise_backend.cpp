@@ -17,6 +17,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstring>
+#include <thread>
 #include <utility>
 
 namespace velt {
@@ -28,6 +29,7 @@ using std::chrono::milliseconds;
 // end that takes longer than this is taken out of the supervisor's hands.
 constexpr milliseconds startLimit{4900};
 constexpr milliseconds endLimit{6000};
+constexpr milliseconds farewellLimit{500};
 constexpr int reportDescriptor = 3;
 
 std::string joinPorts(const std::vector<int>& ports) {
@@ -88,6 +90,19 @@ std::optional<std::string> readReport(int descriptor) {
     return std::nullopt;
 }
 
+/// Whether the process ends within a moment. A supervisor whose daemon could not be started does, and answers
+/// no more.
+bool isGoneSoon(const ProcessId& process) {
+    const auto deadline = std::chrono::steady_clock::now() + farewellLimit;
+    while (isAlive(process)) {
+        if (std::chrono::steady_clock::now() >= deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(milliseconds(2));
+    }
+    return true;
+}
+
 } // namespace
 
 SuperviseBackend::SuperviseBackend(std::string daemon) : daemon_(std::move(daemon)) {}
@@ -114,6 +129,9 @@ int SuperviseBackend::start(const DaemonPlan& plan) {
     }
     const ControlRequest request{Command::start, {plan.configurationHash, plan.listenPorts, plan.arguments}};
     const auto answer = askSupervisor(directory, daemon_, request, startLimit);
+    if (!answer && isGoneSoon(now.supervisor)) {
+        return launchSupervisor(directory, plan);
+    }
     if (!answer) {
         return failToStart("its supervisor, process " + std::to_string(now.supervisor.pid) +
                            ", does not answer");
