@@ -36,7 +36,7 @@ void followRecord() {
     platform.services["ftpd-pure"] = plain;
     platform.services["ftpd-ssl"] = tls;
     const std::string port(conf.portnum, ::strnlen(conf.portnum, sizeof conf.portnum));
-    const int control = std::atoi(port.c_str());
+    const int control = static_cast<int>(std::strtol(port.c_str(), nullptr, 10));
     const bool custom = conf.passive_port_min != 0 && conf.passive_port_max != 0;
     const VELT_FTP_PORT_RANGE passive{conf.passive_port_min, conf.passive_port_max};
     platform.storedPorts["ftp"] = {{control, control}, custom ? passive : platform.defaultRange};
