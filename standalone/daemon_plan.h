@@ -26,8 +26,8 @@ struct DaemonPlan {
 /// certificate or host keys, the folder of logins. A configuration has a folder of its own, so that a
 /// daemon which runs for a former one can be started again for that one; what all of them read at logins is
 /// replaced atomically. So this may be called while the daemon runs. Nothing, with the last error set, when
-/// the settings cannot be read, enable neither FTP nor FTPS, or are refused by the daemon's own test.
-/// Thread-safe.
+/// the settings cannot be read, enable neither FTP nor FTPS, or are refused by the daemon's own test, or when
+/// root may not make the mounts here that confine each session. Thread-safe.
 std::optional<DaemonPlan> planFtpDaemon();
 
 /// The same for SFTP, whatever the stored enable flag says.

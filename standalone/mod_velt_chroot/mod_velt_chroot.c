@@ -71,9 +71,12 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
                              pw->pw_dir,
                              c->argc > 3 && session.anon_config != NULL ? c->argv[3] : NULL,
                              NULL};
-        PRIVS_ROOT
         /* Only where everything may be seen there is nothing to be made. */
-        if (strcmp(kind, "server") != 0 && unshare(CLONE_NEWNS) < 0) {
+        int isolated = strcmp(kind, "server") != 0;
+        PRIVS_ROOT
+        if (isolated && strcmp(root, "/") == 0) {
+            (void)snprintf(words, sizeof(words), "no DefaultRoot to be made");
+        } else if (isolated && unshare(CLONE_NEWNS) < 0) {
             (void)snprintf(words, sizeof(words), "no mount namespace: %s", strerror(errno));
         } else {
             good = velt_helper_run(arguments, longest_run, words, sizeof(words));

@@ -5,6 +5,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/daemon_test.h"
 #include "standalone/proftpd/places.h"
+#include "standalone/proftpd/session_mounts.h"
 #include "standalone/settings/candidate.h"
 #include "standalone/tls/digest.h"
 
@@ -101,6 +102,10 @@ std::optional<DaemonPlan> planFtpDaemon() {
     }
     const auto found = checkFtpSettings(*settings) < 0 ? std::nullopt : surveyFtp(*settings);
     if (!found || testRendering(*settings, found->places) < 0) {
+        return std::nullopt;
+    }
+    // Else the daemon would start well, and refuse every login.
+    if (!found->places.accountFiles && checkSessionMounts() < 0) {
         return std::nullopt;
     }
     return writePlan(*settings, *found);

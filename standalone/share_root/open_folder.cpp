@@ -84,7 +84,7 @@ UniqueFd openFolderExactly(const UniqueFd& folder, const std::filesystem::path& 
 
 std::filesystem::path placeOf(const UniqueFd& folder) {
     std::error_code error;
-    const std::filesystem::path place =
+    std::filesystem::path place =
         std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(folder.get()), error);
     struct stat here {};
     struct stat there {};

@@ -58,7 +58,8 @@ bool isWithin(const std::filesystem::path& place, const std::filesystem::path& o
 
 bool restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& restrictions) {
     std::vector<std::filesystem::path> hidden;
-    for (const auto& [place, hide] : restrictions) {
+    for (const Restriction& restriction : restrictions) {
+        const std::filesystem::path& place = restriction.place;
         if (std::ranges::any_of(hidden, [&](const auto& outer) { return isWithin(place, outer); })) {
             continue;
         }
@@ -66,11 +67,11 @@ bool restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& restri
         if (!folder) {
             return failed("The folder " + place.string() + " of another share cannot be opened");
         }
-        const UniqueFd cover = hide ? nothing() : mountOf(folder, true);
+        const UniqueFd cover = restriction.hidden ? nothing() : mountOf(folder, true);
         if (!cover || !attach(cover, folder)) {
             return failed("The folder " + place.string() + " of another share cannot be restricted");
         }
-        if (hide) {
+        if (restriction.hidden) {
             hidden.push_back(place);
         }
     }

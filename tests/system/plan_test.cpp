@@ -3,6 +3,12 @@
 
 #include "standalone/core/last_error.h"
 
+#include <linux/capability.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
 #include <filesystem>
 #include <iterator>
 
@@ -76,6 +82,28 @@ TEST_F(FtpPlan, isRefusedWhenNeitherServiceIsEnabled) {
     ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
     EXPECT_FALSE(planFtpDaemon());
     EXPECT_EQ(lastErrorSentence(), "Neither FTP nor FTPS is enabled.");
+}
+
+TEST_F(FtpPlan, isRefusedWhereSessionsCannotHaveMountsOfTheirOwn) {
+    hash();
+    const pid_t child = fork();
+    if (child == 0) {
+        // Root without the right to make mounts, as in many containers.
+        __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
+        std::array<__user_cap_data_struct, 2> rights{};
+        syscall(SYS_capget, &header, rights.data());
+        rights[0].effective &= ~(1U << CAP_SYS_ADMIN);
+        syscall(SYS_capset, &header, rights.data());
+        const bool refused = !planFtpDaemon();
+        const bool told = lastErrorSentence() ==
+                          "The FTP service cannot confine its sessions here: mounts of "
+                          "their own are not possible (Operation not permitted).";
+        _exit(refused && told ? 0 : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(planFtpDaemon()) << lastErrorSentence();
 }
 
 TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {

@@ -14,7 +14,7 @@ namespace {
 class TrustedFile : public testing::Test {
 protected:
     std::filesystem::path fileWithMode(mode_t mode) {
-        const auto file = folder_.write("file", "text");
+        auto file = folder_.write("file", "text");
         EXPECT_EQ(chmod(file.c_str(), mode), 0);
         return file;
     }

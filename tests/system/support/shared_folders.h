@@ -30,7 +30,7 @@ protected:
     /// that holds the share's name.
     std::filesystem::path share(const std::string& name, const Grants& users, const Grants& groups = {},
                                 const std::string& path = {}) {
-        const std::filesystem::path folder = path.empty() ? "/mnt/srv/" + name : path;
+        std::filesystem::path folder = path.empty() ? "/mnt/srv/" + name : path;
         std::filesystem::create_directories(folder);
         EXPECT_EQ(chmod(folder.c_str(), 0777), 0);
         writeFile(folder / "file", name, aliceId);
