@@ -91,7 +91,7 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
     return good;
 }
 
-/* Makes the view, `general` being the kind of the configuration, when `anonymous` is not. */
+/* Makes `root` show what the user who logs in may see. */
 static int make_view(const char* root, int anonymous) {
     const config_rec* c = find_config(main_server->conf, CONF_PARAM, "VeltLoginRoot", FALSE);
     const char* user = session.user;
