@@ -1,8 +1,9 @@
 #include "standalone/services/systemd_unit.h"
 
+#include "standalone/ports/port_range.h"
+
 #include <array>
 #include <cstdio>
-#include <cstdlib>
 #include <sstream>
 
 namespace velt {
@@ -71,7 +72,8 @@ DaemonPlan readUnit(std::string_view text) {
         if (line.starts_with(hashKey)) {
             plan.configurationHash = line.substr(hashKey.size());
         } else if (line.starts_with(portKey)) {
-            plan.listenPorts.push_back(std::atoi(line.c_str() + portKey.size()));
+            if (const auto port = parsePortRange(std::string_view(line).substr(portKey.size())))
+                plan.listenPorts.push_back(port->first);
         }
     }
     return plan;
