@@ -44,6 +44,7 @@ std::string joinPorts(const std::vector<int>& ports) {
 /// on in a child of its own. 0, or an errno.
 int spawnDetached(std::vector<std::string> arguments, int report) {
     std::vector<char*> pointers;
+    pointers.reserve(arguments.size() + 1);
     for (std::string& argument : arguments) {
         pointers.push_back(argument.data());
     }

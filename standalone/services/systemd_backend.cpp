@@ -147,8 +147,9 @@ std::vector<ProcessId> SystemdBackend::unitProcesses(const std::string& controlG
     // The group is looked for by the unit's own place as well: after a pause systemd has forgotten it, while
     // the sessions are still in it.
     const std::string path = controlGroup.empty() ? "/system.slice/" + unitName(daemon_) : controlGroup;
-    for (const std::string& hierarchy : {std::string(), std::string("/systemd"), std::string("/unified")}) {
-        std::ifstream members(places_.cgroups.string() + hierarchy + path + "/cgroup.procs");
+    for (const char* hierarchy : {"", "/systemd", "/unified"}) {
+        std::ifstream members(
+            places_.cgroups.string().append(hierarchy).append(path).append("/cgroup.procs"));
         for (pid_t pid = 0; members >> pid;) {
             const auto process = identifyProcess(pid);
             if (process && std::find(processes.begin(), processes.end(), *process) == processes.end()) {
