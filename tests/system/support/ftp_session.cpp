@@ -39,7 +39,9 @@ UniqueFd connectTo(const std::string& host, int port, const std::string& from) {
     setsockopt(connection.get(), SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit);
     if (!from.empty()) {
         const sockaddr_in own = addressOf(from, 0);
-        bind(connection.get(), reinterpret_cast<const sockaddr*>(&own), sizeof own);
+        if (bind(connection.get(), reinterpret_cast<const sockaddr*>(&own), sizeof own) < 0) {
+            return {};
+        }
     }
     const sockaddr_in address = addressOf(host, port);
     if (connect(connection.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) < 0) {
