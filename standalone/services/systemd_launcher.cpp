@@ -39,7 +39,7 @@ std::string SystemdLauncher::launch(const std::filesystem::path& directory, cons
     if (std::string reason = keep(directory, plan); !reason.empty()) {
         return reason;
     }
-    if (std::string reason = writeUnit(directory); !reason.empty()) {
+    if (std::string reason = writeUnits(directory); !reason.empty()) {
         return reason;
     }
     // Not "start": after a killed supervisor systemd may be waiting to start it again, and a daemon of the
@@ -60,15 +60,21 @@ std::string SystemdLauncher::keep(const std::filesystem::path& directory, const 
                                                                                       : std::string();
 }
 
-/// systemd reads all its units again for one that is new, which it need not do for one that is as it was.
-std::string SystemdLauncher::writeUnit(const std::filesystem::path& directory) const {
-    const std::filesystem::path file = places_.units / unitName(daemon_);
-    const std::string text = renderUnit(daemon_, directory);
-    if (readFile(file) == text) {
-        return {};
+/// systemd reads all its units again for new ones, which it need not do for those that are as they were.
+std::string SystemdLauncher::writeUnits(const std::filesystem::path& directory) const {
+    bool written = false;
+    for (const UnitFile& unit : unitFiles(daemon_, directory)) {
+        const std::filesystem::path file = places_.units / unit.name;
+        if (readFile(file) == unit.text) {
+            continue;
+        }
+        if (replaceFile(file, unit.text, 0644) < 0) {
+            return lastErrorSentence();
+        }
+        written = true;
     }
-    if (replaceFile(file, text, 0644) < 0) {
-        return lastErrorSentence();
+    if (!written) {
+        return {};
     }
     const ProcessResult reloaded = runProcess({places_.systemctl, "daemon-reload"});
     return reloaded.exitCode == 0 ? std::string() : reasonOf(reloaded);

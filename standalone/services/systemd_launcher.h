@@ -26,7 +26,7 @@ public:
     std::string retire() override;
 
 private:
-    std::string writeUnit(const std::filesystem::path& directory) const;
+    std::string writeUnits(const std::filesystem::path& directory) const;
     std::string reasonOfFailure() const;
 
     std::string daemon_;

@@ -59,4 +59,13 @@ std::string renderUnit(const std::string& daemon, const std::filesystem::path& d
     return text.str();
 }
 
+std::vector<UnitFile> unitFiles(const std::string& daemon, const std::filesystem::path& directory) {
+    std::vector<UnitFile> files{{unitName(daemon), renderUnit(daemon, directory)}};
+    if (daemon == "sftp") {
+        // /run/sshd is that unit's, and gone when it is stopped; but each of our connections needs it, too.
+        files.push_back({"ssh.service.d/velt-sftp.conf", "[Service]\nRuntimeDirectoryPreserve=yes\n"});
+    }
+    return files;
+}
+
 } // namespace velt

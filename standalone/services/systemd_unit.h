@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace velt {
 
@@ -13,6 +14,14 @@ std::string unitName(const std::string& daemon);
 
 /// The text of the unit that runs the daemon's supervisor, which finds what to start in the directory.
 std::string renderUnit(const std::string& daemon, const std::filesystem::path& directory);
+
+struct UnitFile {
+    std::filesystem::path name; ///< below the folder of units
+    std::string text;
+};
+
+/// All that systemd is given for the daemon.
+std::vector<UnitFile> unitFiles(const std::string& daemon, const std::filesystem::path& directory);
 
 /// One argument as a word of ExecStart=, safe against every meaning that systemd gives to characters.
 std::string quoteUnitWord(std::string_view argument);

@@ -128,6 +128,16 @@ TEST_F(SystemdTest, AStartWritesTheUnitAndReturnsWhenTheDaemonListens) {
     EXPECT_EQ(calls(), "restart velt-sftp.service\n") << "the unit is as it was";
 }
 
+TEST_F(SystemdTest, TheStockServersStopLeavesTheFolderThatEachConnectionNeeds) {
+    start("one");
+    EXPECT_EQ(readFile(places_.units / "ssh.service.d/velt-sftp.conf"),
+              "[Service]\nRuntimeDirectoryPreserve=yes\n");
+    SuperviseBackend ftp("ftpd", std::make_unique<SystemdLauncher>("ftpd", places_));
+    std::filesystem::remove_all(places_.units / "ssh.service.d");
+    EXPECT_LT(ftp.start(testPlan(freePort(), "one", {"--refuse", "no"})), 0);
+    EXPECT_FALSE(std::filesystem::exists(places_.units / "ssh.service.d")) << "FTP does not need it";
+}
+
 TEST_F(SystemdTest, SessionsThatWereMovedOutOfTheUnitOutliveAPauseAndEndWithAStop) {
     start("one");
     Client client(port_); // no control group tells whose session this is
