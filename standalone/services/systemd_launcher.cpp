@@ -47,7 +47,9 @@ std::string SystemdLauncher::launch(const std::filesystem::path& directory, cons
     const ProcessResult started =
         runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
     if (started.exitCode == 0) {
-        return {};
+        const auto now = readServiceState(stateFile(directory, daemon_));
+        return now && isServing(*now) ? std::string()
+                                      : "systemd says that it has started it, but it does not serve";
     }
     std::string reason = started.exitCode < 0 ? "its supervisor does not report in time" : reasonOfFailure();
     runProcess({places_.systemctl, "stop", "--no-block", unitName(daemon_)});

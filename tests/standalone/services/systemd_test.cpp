@@ -185,6 +185,13 @@ TEST_F(SystemdTest, SystemdsOwnRefusalIsNamed) {
     EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: systemctl ended with status 3.");
 }
 
+TEST_F(SystemdTest, AnAnswerIsNotTakenForADaemon) {
+    answerWith("exit 0\n"); // as in a changed root, where systemctl ignores all requests
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(),
+              "The SFTP daemon does not start: systemd says that it has started it, but it does not serve.");
+}
+
 TEST_F(SystemdTest, AStartIsOverWithinFiveSeconds) {
     answerWith("[ $1 = restart ] && exec sleep 20\nexit 0\n");
     const auto began = std::chrono::steady_clock::now();

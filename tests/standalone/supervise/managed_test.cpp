@@ -72,12 +72,15 @@ protected:
         return pid;
     }
 
-    std::string heard() const {
+    static constexpr const char* nothing = "nothing";
+
+    /// The next message.
+    std::string heard(int flags = 0) const {
         std::array<char, 1000> message{};
         const timeval limit{5, 0};
         ::setsockopt(socket_, SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit);
-        const ssize_t length = ::recv(socket_, message.data(), message.size(), 0);
-        return length < 0 ? "nothing" : std::string(message.data(), static_cast<std::size_t>(length));
+        const ssize_t length = ::recv(socket_, message.data(), message.size(), flags);
+        return length < 0 ? nothing : std::string(message.data(), static_cast<std::size_t>(length));
     }
 
     static int exitCodeOf(pid_t pid) {
@@ -119,10 +122,12 @@ TEST_F(ManagedSupervisor, TheManagersPlaceMayBeNoFile) {
 
 TEST_F(ManagedSupervisor, AFailedStartIsItsLastWord) {
     order({"--refuse", "fatal: no such certificate"});
-    const pid_t supervisor = run();
-    EXPECT_EQ(heard(), "STATUS=the daemon does not serve: fatal: no such certificate");
-    EXPECT_EQ(heard(), "STATUS=fatal: no such certificate");
-    EXPECT_EQ(exitCodeOf(supervisor), 1);
+    EXPECT_EQ(exitCodeOf(run()), 1);
+    std::string last;
+    for (std::string next = heard(MSG_DONTWAIT); next != nothing; next = heard(MSG_DONTWAIT)) {
+        last = next;
+    }
+    EXPECT_EQ(last, "STATUS=fatal: no such certificate");
 }
 
 TEST_F(ManagedSupervisor, WithoutAnOrderItSaysSo) {
