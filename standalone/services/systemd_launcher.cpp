@@ -95,6 +95,8 @@ std::string SystemdLauncher::retire() {
         return {};
     }
     const ProcessResult stopped = runProcess({places_.systemctl, "stop", unitName(daemon_)});
+    // A daemon that did not start is a failure of the machine's until somebody switches it off.
+    runProcess({places_.systemctl, "reset-failed", unitName(daemon_)});
     return stopped.exitCode == 0 ? std::string() : reasonOf(stopped);
 }
 

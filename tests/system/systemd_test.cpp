@@ -90,6 +90,9 @@ TEST_F(UnderSystemd, aStartThatFailsSaysWhyWithinFiveSeconds) {
         EXPECT_NE(lastErrorSentence().find("in time"), std::string::npos) << lastErrorSentence();
         EXPECT_NE(runProcess({"pidof", "sleep"}).exitCode, 0) << "it still runs";
 
+        EXPECT_EQ(unitState("velt-ftpd.service"), "failed");
+        EXPECT_EQ(backend.stop(), 0) << lastErrorSentence();
+        EXPECT_EQ(unitState("velt-ftpd.service"), "inactive") << "what is switched off is no failure";
         storeFtp(plain);
         EXPECT_EQ(VLIBServiceStart("ftpd", 0), 0) << "a failure is over: " << lastErrorSentence();
         EXPECT_EQ(fetchByFtp(), "alice");
