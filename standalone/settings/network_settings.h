@@ -15,7 +15,8 @@ struct NetworkSettings {
 ///     version = 1
 ///     loopback_only = 1
 ///
-/// Nothing, with the last error naming file and line, when the file cannot be read or is damaged. Thread-safe.
+/// Nothing, with the last error naming file and line, when the file cannot be read or is damaged.
+/// Thread-safe.
 std::optional<NetworkSettings> loadNetworkSettings();
 
 } // namespace velt
