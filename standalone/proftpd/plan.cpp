@@ -9,8 +9,6 @@
 #include "standalone/settings/candidate.h"
 #include "standalone/tls/digest.h"
 
-#include <cstdlib>
-
 namespace velt {
 namespace {
 
@@ -79,7 +77,7 @@ std::optional<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings
     // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
     plan.arguments = {program, "-n", "-c", configuration.string()};
     plan.executable = program;
-    plan.listenPorts = {std::atoi(settings.record.portnum)};
+    plan.listenPorts = {controlPort(settings.record)};
     return plan;
 }
 
