@@ -20,7 +20,7 @@ std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon) {
 }
 
 std::filesystem::path runDirectory() {
-    const std::filesystem::path directory = statePath("/run/velt");
+    std::filesystem::path directory = statePath("/run/velt");
     std::error_code error;
     std::filesystem::create_directories(directory, error);
     if (error) {

@@ -85,7 +85,7 @@ std::string Supervisor::begin(const DaemonOrder& order) {
         return "the supervisor cannot make its control socket in " + directory_.string();
     }
     order_ = order;
-    const std::string reason = startDaemon(deadline);
+    std::string reason = startDaemon(deadline);
     if (!reason.empty()) {
         control_.reset();
         endProcesses([] { return descendantsOf(::getpid()); }, patience);
