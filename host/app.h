@@ -46,6 +46,7 @@ private:
     /// A request on its way.
     struct Job {
         HttpRequest request;
+        std::vector<std::string> path; ///< its segments
         Principal principal;
         std::string id;
         Done done;
@@ -55,7 +56,7 @@ private:
     /// One of the host's own endpoints.
     struct Endpoint {
         const char* method;
-        const char* path; ///< what ends in "/" stands for all paths below
+        std::vector<std::string> path; ///< its segments; "*" stands for any one
         bool adminOnly;
         RequestOrder::Kind kind;
         HttpResponse (App::*answer)(const Job& job);

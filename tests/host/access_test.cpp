@@ -12,6 +12,7 @@
 #include <chrono>
 #include <fstream>
 #include <iterator>
+#include <sstream>
 #include <thread>
 
 namespace {
@@ -203,6 +204,20 @@ TEST_F(HostAccess, TokensAreListedMadeAndRemoved) {
     EXPECT_EQ(ask("DELETE", "/api/tokens/" + token["id"].asString(), admin).status, 204);
     EXPECT_EQ(ask("GET", "/healthz", header).status, 401);
     EXPECT_EQ(ask("DELETE", "/api/tokens/" + token["id"].asString(), admin).status, 404);
+}
+
+TEST_F(HostAccess, OnlyATokensOwnPathRemovesIt) {
+    start();
+    const std::string id = post("/api/tokens", R"({"name":"bench","role":"viewer"})").json()["id"].asString();
+    const std::string path = "/api/tokens/";
+    for (const std::string& target : {path + "a/" + id, path + id + "/", path + "/" + id, path + "a%2F" + id,
+                                      path + "../tokens/" + id, path, path + id + "%00", path + "*"}) {
+        EXPECT_EQ(ask("DELETE", target, admin).status, 404) << target;
+    }
+    EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 3U);
+    std::ostringstream escaped;
+    escaped << path << '%' << std::hex << static_cast<int>(id[0]) << id.substr(1);
+    EXPECT_EQ(ask("DELETE", escaped.str(), admin).status, 204) << escaped.str();
 }
 
 TEST_F(HostAccess, ATokenNeedsANameAndARole) {
