@@ -164,11 +164,7 @@ TEST_F(HostLimits, WhoOnlyConnectsGivesWay) {
     }
     EXPECT_EQ(get("/healthz").status, 200);
     EXPECT_TRUE(idle.front().ended()) << "the oldest goes first";
-    EXPECT_EQ(idle.back()
-                  .ask((idle.size() % 2 == 0 ? "thz" : "GET /healthz") +
-                       (" HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n"))
-                  .status,
-              200);
+    EXPECT_EQ(idle.back().ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
     EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200) << "one with access stays";
     EXPECT_LE(server->connections(), 6U);
 }
