@@ -240,6 +240,18 @@ TEST_F(HostRows, StatusComesFromTheModulesAnswers) {
     EXPECT_EQ(get("/healthz").json()["status"], "ok");
 }
 
+TEST_F(HostRows, StatusTellsWhatIsStoredBesideWhatRuns) {
+    platform.conf.service_flags = 2;
+    platform.sftp.enable = 1;
+    platform.sftpAlive = 0;
+    const Json::Value services = get("/api/status").json()["services"];
+    EXPECT_EQ(services[0]["wanted"], false);
+    EXPECT_EQ(services[1]["wanted"], true);
+    EXPECT_EQ(services[1]["enabled"], false);
+    EXPECT_EQ(services[2]["wanted"], true);
+    EXPECT_EQ(services[2]["enabled"], false);
+}
+
 TEST_F(HostRows, MetricsCountRequestsByRowAndOutcome) {
     platform.services["ftpd"] = 1;
     get(ftp + "3/get");
