@@ -153,6 +153,7 @@ void RequestReader::fillRequest() {
     // Two of them leave open which one counts, so neither does.
     const bool one = message.count(http::field::authorization) <= 1;
     request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
+    request_.ifMatch = text(message[http::field::if_match]);
     keepAlive_ = refusal_.detail.empty() && message.keep_alive();
     expectsContinue_ =
         boost::beast::iequals(message[http::field::expect], "100-continue") && !parser.is_done();
