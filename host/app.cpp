@@ -189,10 +189,18 @@ void App::serveRow(const JobPointer& job, const Row& row) {
 }
 
 HttpResponse App::callAndAnswer(const Job& job, const Row& row, const Json::Value& parameters) {
+    // Writes run one at a time, so nothing comes between this look and the change.
+    if (!row.reads() && !revision_.allows(job.request.ifMatch)) {
+        return problem(412, "The settings have changed since they were read. Nothing was changed.", job.id);
+    }
     const Outcome outcome = callRow(row, parameters, job.principal);
     HttpResponse response = answerFor(row, parameters, outcome, openApi_, job.id);
     metrics_.countRequest(row, outcome);
     logOutcome(job, row, outcome, response.status);
+    if (outcome.platform.changed) {
+        revision_.advance();
+    }
+    response.headers.emplace_back("ETag", revision_.tag());
     if (!row.reads() && outcome.platform.changed) {
         Json::Value data(Json::objectValue);
         data["api"] = row.api;

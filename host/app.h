@@ -10,6 +10,7 @@
 #include "host/module_table.h"
 #include "host/openapi.h"
 #include "host/request_order.h"
+#include "host/revision.h"
 #include "host/token_store.h"
 
 #include <chrono>
@@ -95,6 +96,7 @@ private:
     OpenApi openApi_;
     Metrics metrics_;
     EventHub events_;
+    Revision revision_;
     RequestOrder order_; // the last, so that its threads end before what they use
 };
 

@@ -5,6 +5,7 @@
 #include "host/json_text.h"
 #include "host/module_call.h"
 #include "host/problem.h"
+#include "host/stored_switches.h"
 
 #include <utility>
 
@@ -22,6 +23,17 @@ Json::Value service(const char* name, const Json::Value& enabled, const Json::Va
     object["enabled"] = enabled;
     object["port"] = port;
     return object;
+}
+
+/// Adds "wanted" to each service: whether the stored settings ask for it, running or not.
+void addWanted(Json::Value& services) {
+    const auto stored = readStoredSwitches();
+    for (Json::Value& each : services) {
+        if (stored) {
+            const std::string name = each["name"].asString();
+            each["wanted"] = name == "sftp" ? stored->sftp : name == "ftps" ? stored->ftps : stored->ftp;
+        }
+    }
 }
 
 Json::Value toObject(const Token& token) {
@@ -127,6 +139,7 @@ HttpResponse App::status(const Job& job) {
     const auto uptime = std::chrono::steady_clock::now() - start_;
     value["uptime_seconds"] = Json::Int64{std::chrono::duration_cast<std::chrono::seconds>(uptime).count()};
     value["services"] = services(job.principal);
+    addWanted(value["services"]);
     return jsonResponse(200, value);
 }
 

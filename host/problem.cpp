@@ -9,7 +9,7 @@
 namespace velt::host {
 
 const char* reasonPhrase(int status) {
-    static constexpr std::array<std::pair<int, const char*>, 19> phrases{{
+    static constexpr std::array<std::pair<int, const char*>, 20> phrases{{
         {200, "OK"},
         {201, "Created"},
         {204, "No Content"},
@@ -20,6 +20,7 @@ const char* reasonPhrase(int status) {
         {405, "Method Not Allowed"},
         {408, "Request Timeout"},
         {409, "Conflict"},
+        {412, "Precondition Failed"},
         {413, "Content Too Large"},
         {417, "Expectation Failed"},
         {422, "Unprocessable Content"},

@@ -32,6 +32,7 @@ struct HttpRequest {
     std::string origin;        ///< "" when there is none
     std::string fetchSite;     ///< "" when there is none
     std::string authorization; ///< "" when there is none
+    std::string ifMatch;       ///< "" when there is none
     std::string body;
     bool wellFormed = true; ///< else the server refuses it as soon as access is granted
 

@@ -161,6 +161,7 @@ void RequestReader::fillRequest() {
     // Two of them leave open which one counts, so neither does.
     const bool one = message.count(http::field::authorization) <= 1;
     request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
+    request_.ifMatch = text(message[http::field::if_match]);
     request_.wellFormed = refusal_.detail.empty();
     keepAlive_ = request_.wellFormed && message.keep_alive();
     expectsContinue_ = request_.wellFormed && !parser.is_done() &&

@@ -271,6 +271,39 @@ TEST_F(HostRows, StatusComesFromTheModulesAnswers) {
     EXPECT_EQ(get("/healthz").json()["status"], "ok");
 }
 
+TEST_F(HostRows, StatusTellsWhatIsStoredBesideWhatRuns) {
+    platform.conf.service_flags = 2;
+    platform.sftp.enable = 1;
+    platform.sftpAlive = 0;
+    const Json::Value services = get("/api/status").json()["services"];
+    EXPECT_EQ(services[0]["wanted"], false);
+    EXPECT_EQ(services[1]["wanted"], true);
+    EXPECT_EQ(services[1]["enabled"], false);
+    EXPECT_EQ(services[2]["wanted"], true);
+    EXPECT_EQ(services[2]["enabled"], false);
+}
+
+TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
+    const std::string seen = get(sftp + "get").header("etag");
+    EXPECT_EQ(get(ftp + "3/get").header("etag"), seen) << "reading changes nothing";
+    const std::string ifSeen = admin + "If-Match: " + seen + "\r\n";
+    EXPECT_EQ(ask("POST", sftp + "set", ifSeen, R"({"enable":false,"portnum":22})").status, 204);
+    EXPECT_EQ(get(sftp + "get").header("etag"), seen) << "nothing was different";
+    const Answer first = ask("POST", sftp + "set", ifSeen, R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(first.status, 204);
+    EXPECT_NE(first.header("etag"), seen);
+    const Answer second = ask("POST", sftp + "set", ifSeen, R"({"enable":true,"portnum":2223})");
+    EXPECT_EQ(second.status, 412);
+    EXPECT_EQ(second.json()["detail"],
+              "The settings have changed since they were read. Nothing was changed.");
+    EXPECT_EQ(platform.sftp.port, 2222);
+    EXPECT_EQ(ask("GET", sftp + "get", ifSeen).status, 200) << "a read is no change";
+    const std::string ifNow = admin + "If-Match: \"other\", " + first.header("etag") + "\r\n";
+    EXPECT_EQ(ask("POST", sftp + "set", ifNow, R"({"enable":true,"portnum":2223})").status, 204);
+    EXPECT_EQ(ask("POST", sftp + "set", admin + "If-Match: *\r\n", R"({"enable":true,"portnum":22})").status,
+              204);
+}
+
 TEST_F(HostRows, MetricsCountRequestsByRowAndOutcome) {
     platform.services["ftpd"] = 1;
     get(ftp + "3/get");
