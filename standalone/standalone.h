@@ -51,6 +51,10 @@ struct ServiceDown {
 /// error alone.
 std::vector<ServiceDown> servicesDown();
 
+/// How often the daemon behind the service ("ftpd", "sftp") was started again after it had ended by itself,
+/// since its supervisor, or the machine, began. 0 for one that is off, and for an unknown name.
+std::uint64_t daemonRestarts(const std::string& service);
+
 /// Names who makes the request that this thread serves now, and the address it came from, for the entries of
 /// the administrator log. Holds for this thread until the next call; two empty texts: the system itself.
 void setRequestActor(const std::string& actor, const std::string& address);

@@ -8,6 +8,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/services/daemon_control.h"
+#include "standalone/services/service_backend.h"
 #include "standalone/services/services.h"
 #include "standalone/settings/settings.h"
 #include "standalone/standalone.h"
@@ -87,6 +88,12 @@ int startEnabledServices() {
 ServiceState serviceState(const std::string& service) {
     const auto daemon = daemonOf(service.c_str());
     return daemon ? daemonState(*daemon) : ServiceState{};
+}
+
+std::uint64_t daemonRestarts(const std::string& service) {
+    const LastErrorKept kept;
+    const auto daemon = daemonOf(service.c_str());
+    return daemon ? makeServiceBackend(daemonName(*daemon))->restarts() : 0;
 }
 
 } // namespace velt

@@ -90,6 +90,14 @@ TEST_F(ServicesDownTest, ADaemonThatKeepsCrashingTellsItsLastEnd) {
         << testing::PrintToString(servicesDown());
 }
 
+TEST_F(ServicesDownTest, RestartsAreCountedByDaemon) {
+    planDouble().ftpOptions = {"--live", "100"};
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_TRUE(waitUntil([] { return daemonRestarts("ftpd") >= 2; }, seconds(5)));
+    EXPECT_EQ(daemonRestarts("sftp"), 0U);
+    EXPECT_EQ(daemonRestarts("nonsense"), 0U);
+}
+
 TEST_F(ServicesDownTest, DamagedSettingsAreListedSinceNobodyKnowsWhatTheySay) {
     storeSftp(true);
     ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
