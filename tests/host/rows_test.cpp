@@ -132,6 +132,27 @@ TEST_F(HostRows, AFailedOperationTellsThePlatformsSentence) {
               "Failed to get SFTP config. The file sftp.conf cannot be read: Permission denied.");
 }
 
+TEST_F(HostRows, AFailureTellsHowFarTheChangeGot) {
+    const auto detail = [this] {
+        const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+        EXPECT_EQ(answer.status, 500);
+        EXPECT_EQ(answer.json()["code"], 1902);
+        return answer.json()["detail"].asString();
+    };
+    platform.fail("VELTSFTPConfigGet");
+    EXPECT_EQ(detail(), "Failed to get SFTP config. Nothing was changed.");
+    platform.reset();
+    platform.fail("VLIBServiceStart");
+    access.sentence = "The SFTP daemon does not start: bad luck.";
+    const std::string started = detail();
+    EXPECT_TRUE(started.ends_with(" The SFTP daemon does not start: bad luck. The new settings are stored."))
+        << started;
+    platform.reset();
+    access.storeFailed = true;
+    platform.fail("VLIBServiceStart");
+    EXPECT_TRUE(detail().ends_with(" Some of the new settings are stored."));
+}
+
 TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {
     const Answer answer = post(sftp + "set", R"({"enable":"yes"})");
     const std::string id = "request=" + answer.header("x-request-id") + " ";
@@ -258,31 +279,6 @@ TEST_F(HostRows, TheRowsAreListed) {
     EXPECT_EQ(reads, 8);
 }
 
-TEST_F(HostRows, StatusComesFromTheModulesAnswers) {
-    platform.services["ftpd"] = 1;
-    platform.sftp.port = 2022;
-    const Json::Value status = get("/api/status").json();
-    EXPECT_EQ(status["services"][0]["name"], "ftp");
-    EXPECT_EQ(status["services"][0]["enabled"], true);
-    EXPECT_EQ(status["services"][0]["port"], 21);
-    EXPECT_EQ(status["services"][1]["enabled"], false);
-    EXPECT_EQ(status["services"][2]["name"], "sftp");
-    EXPECT_EQ(status["services"][2]["port"], 2022);
-    EXPECT_EQ(get("/healthz").json()["status"], "ok");
-}
-
-TEST_F(HostRows, StatusTellsWhatIsStoredBesideWhatRuns) {
-    platform.conf.service_flags = 2;
-    platform.sftp.enable = 1;
-    platform.sftpAlive = 0;
-    const Json::Value services = get("/api/status").json()["services"];
-    EXPECT_EQ(services[0]["wanted"], false);
-    EXPECT_EQ(services[1]["wanted"], true);
-    EXPECT_EQ(services[1]["enabled"], false);
-    EXPECT_EQ(services[2]["wanted"], true);
-    EXPECT_EQ(services[2]["enabled"], false);
-}
-
 TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
     const std::string seen = get(sftp + "get").header("etag");
     EXPECT_EQ(get(ftp + "3/get").header("etag"), seen) << "reading changes nothing";
@@ -302,23 +298,6 @@ TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
     EXPECT_EQ(ask("POST", sftp + "set", ifNow, R"({"enable":true,"portnum":2223})").status, 204);
     EXPECT_EQ(ask("POST", sftp + "set", admin + "If-Match: *\r\n", R"({"enable":true,"portnum":22})").status,
               204);
-}
-
-TEST_F(HostRows, MetricsCountRequestsByRowAndOutcome) {
-    platform.services["ftpd"] = 1;
-    get(ftp + "3/get");
-    post(sftp + "set", "{}");
-    post(sftp + "set", R"({"enable":true})");
-    const std::string text = get("/metrics").body;
-    for (
-        const char* line :
-        {R"(velt_requests_total{api="VELT.Core.FileServ.FTP",method="get",outcome="success",version="3"} 1)",
-         R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="1901",version="1"} 1)",
-         R"(velt_service_up{service="ftp"} 1)", R"(velt_service_up{service="ftps"} 0)",
-         R"(velt_service_up{service="sftp"} 1)", R"(velt_daemon_starts_total{service="sftp"} 1)",
-         "velt_request_duration_seconds_bucket"}) {
-        EXPECT_NE(text.find(line), std::string::npos) << line << "\n" << text;
-    }
 }
 
 } // namespace
