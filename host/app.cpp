@@ -240,6 +240,9 @@ void App::run(const JobPointer& job, RequestOrder::Kind kind, std::function<Http
         HttpResponse response;
         try {
             response = answer();
+        } catch (const TokenError& error) {
+            log_.write(job->id, error.what());
+            response = problem(500, error.what(), job->id);
         } catch (const std::exception& error) {
             log_.write(job->id, std::string("internal error: ") + error.what());
             response = problem(500, "The host failed. Its log has more under this request's id.", job->id);
