@@ -184,7 +184,13 @@ TEST_F(HostLimits, ManyWrongTokensKeepNobodyOut) {
     }
     EXPECT_EQ(get("/healthz").status, 200);
     EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
-    EXPECT_EQ(guesses.front().receive().status, 401);
+    int refused = 0;
+    for (Client& guess : guesses) {
+        const int status = guess.receive().status;
+        EXPECT_TRUE(status == 401 || status == 0) << status;
+        refused += status == 401;
+    }
+    EXPECT_GE(refused, 100) << "who gave way got no answer, the others did";
     EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3)) << "those that wait do wait";
 }
 
