@@ -73,6 +73,9 @@ std::optional<Refusal> Access::check(const HttpRequest& head, const Peer& peer, 
     if (auto refusal = authenticate(head, peer, principal)) {
         return refusal;
     }
+    if (!head.wellFormed) {
+        return std::nullopt;
+    }
     if (!peer.isUnixSocket && !knowsHost(head.host, peer)) {
         return refuse(403, "The Host header names \"" + head.host + "\", which is not this host.", peer,
                       false);

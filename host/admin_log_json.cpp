@@ -1,8 +1,9 @@
 #include "host/admin_log_json.h"
 
 #include "host/clock.h"
-#include "host/json_text.h"
+#include "host/percent_encoding.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cstdio>
@@ -20,22 +21,10 @@ std::optional<unsigned> hexDigits(std::string_view text) {
     return error == std::errc() && stop == text.data() + text.size() ? std::optional(value) : std::nullopt;
 }
 
-/// Nothing when an escape is none, or the text is no UTF-8.
-std::optional<std::string> percentDecoded(const std::string& text) {
-    std::string decoded;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        if (text[i] == '%') {
-            const auto byte = i + 2 < text.size() ? hexDigits(text.substr(i + 1, 2)) : std::nullopt;
-            if (!byte) {
-                return std::nullopt;
-            }
-            decoded += static_cast<char>(*byte);
-            i += 2;
-        } else {
-            decoded += text[i] == '+' ? ' ' : text[i];
-        }
-    }
-    return findInvalidUtf8(decoded) == std::string::npos ? std::optional(decoded) : std::nullopt;
+/// Forms write a blank as "+".
+std::optional<std::string> queryValue(std::string text) {
+    std::replace(text.begin(), text.end(), '+', ' ');
+    return percentDecoded(text);
 }
 
 std::optional<std::int64_t> positiveNumber(const std::string& text) {
@@ -108,7 +97,7 @@ std::optional<AdminLogQuery> parseLogQuery(const std::string& query, std::string
     for (std::string part; std::getline(parts, part, '&');) {
         const std::size_t equals = part.find('=');
         const std::string key = part.substr(0, equals);
-        const auto value = percentDecoded(equals == std::string::npos ? "" : part.substr(equals + 1));
+        const auto value = queryValue(equals == std::string::npos ? "" : part.substr(equals + 1));
         if (!value) {
             error = key + ": the value is not encoded as it must be";
             return std::nullopt;

@@ -47,6 +47,7 @@ private:
     /// A request on its way.
     struct Job {
         HttpRequest request;
+        std::vector<std::string> path; ///< its segments
         Principal principal;
         std::string id;
         Done done;
@@ -56,7 +57,7 @@ private:
     /// One of the host's own endpoints.
     struct Endpoint {
         const char* method;
-        const char* path; ///< what ends in "/" stands for all paths below
+        std::vector<std::string> path; ///< its segments; "*" stands for any one
         bool adminOnly;
         RequestOrder::Kind kind;
         HttpResponse (App::*answer)(const Job& job);

@@ -70,15 +70,15 @@ HttpResponse badToken(const std::string& field, const std::string& expected, con
 const std::vector<App::Endpoint>& App::endpoints() {
     using Kind = RequestOrder::Kind;
     static const std::vector<Endpoint> all{
-        {"GET", "/api", false, Kind::unordered, &App::listRows},
-        {"GET", "/healthz", false, Kind::unordered, &App::health},
-        {"GET", "/openapi.json", false, Kind::unordered, &App::openApi},
-        {"GET", "/metrics", false, Kind::read, &App::metrics},
-        {"GET", "/api/status", false, Kind::read, &App::status},
-        {"GET", "/api/log", false, Kind::unordered, &App::adminLog},
-        {"GET", "/api/tokens", true, Kind::unordered, &App::listTokens},
-        {"POST", "/api/tokens", true, Kind::unordered, &App::createToken},
-        {"DELETE", "/api/tokens/", true, Kind::unordered, &App::deleteToken},
+        {"GET", {"api"}, false, Kind::unordered, &App::listRows},
+        {"GET", {"healthz"}, false, Kind::unordered, &App::health},
+        {"GET", {"openapi.json"}, false, Kind::unordered, &App::openApi},
+        {"GET", {"metrics"}, false, Kind::read, &App::metrics},
+        {"GET", {"api", "status"}, false, Kind::read, &App::status},
+        {"GET", {"api", "log"}, false, Kind::unordered, &App::adminLog},
+        {"GET", {"api", "tokens"}, true, Kind::unordered, &App::listTokens},
+        {"POST", {"api", "tokens"}, true, Kind::unordered, &App::createToken},
+        {"DELETE", {"api", "tokens", "*"}, true, Kind::unordered, &App::deleteToken},
     };
     return all;
 }
@@ -202,8 +202,7 @@ HttpResponse App::createToken(const Job& job) {
 }
 
 HttpResponse App::deleteToken(const Job& job) {
-    const std::string path = job.request.path();
-    const std::string id = path.substr(path.rfind('/') + 1);
+    const std::string& id = job.path.back();
     if (!tokens_.remove(id)) {
         return problem(404, "There is no token with the id " + id + ".", job.id);
     }

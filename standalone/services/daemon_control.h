@@ -5,6 +5,7 @@
 #include "standalone/supervise/service_state.h"
 
 #include <optional>
+#include <string>
 #include <string_view>
 
 namespace velt {
@@ -13,6 +14,9 @@ enum class Daemon {
     ftp,  ///< one process for FTP and FTPS
     sftp, ///< a listener and its sessions
 };
+
+/// "ftpd" or "sftp".
+std::string daemonName(Daemon daemon);
 
 /// The daemon behind a service name; nothing, with the last error set, for a name that is none of ours.
 std::optional<Daemon> daemonOf(const char* service);

@@ -28,6 +28,7 @@ public:
     int pause() override;
     int stop() override;
     ServiceState state() const override;
+    std::uint64_t restarts() const override;
 
 private:
     using Clock = std::chrono::steady_clock;

@@ -4,6 +4,7 @@
 
 #include "standalone/supervise/process_identity.h"
 
+#include <cstdint>
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -26,6 +27,7 @@ struct ServiceState {
     std::vector<int> ports;          ///< on which the daemon listens
     std::vector<ProcessId> sessions; ///< those seen when the file was written
     std::string reason;              ///< of a failure, one line
+    std::uint64_t restarts = 0;      ///< of the daemon, after it had ended by itself
 };
 
 /// The files of a service in the folder that holds all of them.

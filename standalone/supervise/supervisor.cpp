@@ -216,6 +216,7 @@ void Supervisor::onDaemonEnd(int waitStatus) {
 }
 
 void Supervisor::restartDaemon() {
+    ++restarts_;
     const std::string reason = startDaemon(Clock::now() + startLimit);
     if (!reason.empty()) {
         ::syslog(LOG_ERR, "the daemon of %s does not start: %s", service_.c_str(), reason.c_str());
@@ -243,6 +244,7 @@ void Supervisor::publish(RunState state, std::string reason) {
     record.sessions = descendantsOf(::getpid());
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);
+    record.restarts = restarts_;
     if (!writeServiceState(stateFile(directory_, service_), record)) {
         ::syslog(LOG_ERR, "the state of %s cannot be written: %s", service_.c_str(), std::strerror(errno));
     }

@@ -152,6 +152,40 @@ TEST_F(HostLimits, ConnectionsBeyondTheLimitAreToldSo) {
     EXPECT_EQ(answer.status, 200);
 }
 
+TEST_F(HostLimits, WhoOnlyConnectsGivesWay) {
+    limits.connections = 5;
+    start();
+    Client trusted = connect();
+    EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200);
+    std::deque<Client> idle;
+    for (int i = 0; i < 20; ++i) {
+        idle.push_back(connect());
+        idle.back().send(i % 2 == 0 ? "" : "GET /heal");
+    }
+    EXPECT_EQ(get("/healthz").status, 200);
+    EXPECT_TRUE(idle.front().ended()) << "the oldest goes first";
+    EXPECT_EQ(idle.back().ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
+    EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200) << "one with access stays";
+    EXPECT_LE(server->connections(), 6U);
+}
+
+TEST_F(HostLimits, ManyWrongTokensKeepNobodyOut) {
+    limits.connections = 100;
+    limits.delayedRefusals = 10;
+    limits.refusalDelay = std::chrono::seconds(3);
+    start();
+    const auto begin = std::chrono::steady_clock::now();
+    std::deque<Client> guesses;
+    for (int i = 0; i < 300; ++i) {
+        guesses.push_back(connect());
+        guesses.back().send(requestText("GET", "/healthz", "Authorization: Bearer guess\r\n"));
+    }
+    EXPECT_EQ(get("/healthz").status, 200);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+    EXPECT_EQ(guesses.front().receive().status, 401);
+    EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3)) << "those that wait do wait";
+}
+
 TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
     rlimit files{};
     ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &files), 0);

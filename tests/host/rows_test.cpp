@@ -1,5 +1,6 @@
 // Requests that reach the module, over the fake platform.
 
+#include "host/json_text.h"
 #include "tests/host/fake_access.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -169,6 +170,36 @@ TEST_F(HostRows, UnknownRowsAndPathsAreNotFound) {
           ftp + "99999999999999999999/get", std::string("/apis")}) {
         EXPECT_EQ(post(target).status, 404) << target;
     }
+}
+
+TEST_F(HostRows, PathsAreDecodedSegmentBySegment) {
+    EXPECT_EQ(get("/%68ealthz").status, 200);
+    EXPECT_EQ(get("/api/VELT%2ECore%2eFileServ.FTP.SFTP/v1/ge%74?unused=%zz").status, 200);
+    EXPECT_EQ(post("/%65vents").header("allow"), "GET");
+    for (const char* target : {"/%", "/%4", "/%zz", "/api/%G0", "/%ff", "/healthz%c3"}) {
+        EXPECT_EQ(get(target).status, 400) << target;
+    }
+    for (const char* target :
+         {"//healthz", "/healthz/", "/./healthz", "/x/../healthz", "/healthz%2F", "/api%2Fstatus",
+          "/healthz;x", "/healthz#x", "/HEALTHZ", "/healthz%00", "/healthz%20", "/api/status/", "/*"}) {
+        EXPECT_EQ(get(target).status, 404) << target;
+    }
+}
+
+TEST_F(HostRows, AnAnswerIsUtf8WhateverTheRequestIs) {
+    const Answer path = get("/caf\xE9");
+    EXPECT_EQ(path.status, 400);
+    EXPECT_EQ(velt::host::findInvalidUtf8(path.body), std::string::npos) << path.body;
+    Client client = connect();
+    const Answer host = client.ask("GET /healthz HTTP/1.1\r\nHost: caf\xE9\r\n" + admin + "\r\n");
+    EXPECT_EQ(host.status, 403);
+    EXPECT_NE(host.json()["detail"].asString().find("\"caf\xEF\xBF\xBD\""), std::string::npos) << host.body;
+}
+
+TEST_F(HostRows, ANameThatIsNoUtf8IsShownAsFarAsItCan) {
+    platform.shares["\xC3\x9C\xFF"] = {"", "/", 1};
+    platform.ftpShares = {"\xC3\x9C\xFF"};
+    EXPECT_EQ(get(security + "list_ftp_share").body, "{\"share\":[\"\xC3\x9C\xEF\xBF\xBD\"]}");
 }
 
 TEST_F(HostRows, AWrongMethodIsToldTheRightOnes) {
