@@ -88,6 +88,9 @@ std::string hintOf(const HttpAnswer& answer, const Json::Value& problem, const E
     default:
         break;
     }
+    if (answer.status >= 500 && problem["changed"] == false) {
+        return "Correct what the server names, in the request or on the server, and try again.";
+    }
     if (answer.status >= 500) {
         return "A part of the change may be in effect: look with 'veltctl status' and 'veltctl log'; the "
                "server's own "

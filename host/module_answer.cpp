@@ -14,20 +14,19 @@ struct Meaning {
     int code;
     int status;
     const char* title;
-    bool beforeAnyChange; ///< the module refuses with it before it touches anything
     bool portTaken;
 };
 
 constexpr int badParameter = 1901;
-constexpr Meaning otherFailure{0, 500, "The operation failed", false, false};
+constexpr Meaning otherFailure{0, 500, "The operation failed", false};
 
 constexpr std::array<Meaning, 6> meanings{{
-    {badParameter, 422, "A parameter is not acceptable", true, false},
-    {1902, 500, "The operation failed", false, false},
-    {1903, 409, "The FTP port is taken", true, true},
-    {1904, 409, "The passive port range is taken", true, true},
-    {1905, 409, "The share cannot be reached over FTP", true, false},
-    {1951, 409, "The SFTP port is taken", true, true},
+    {badParameter, 422, "A parameter is not acceptable", false},
+    {1902, 500, "The operation failed", false},
+    {1903, 409, "The FTP port is taken", true},
+    {1904, 409, "The passive port range is taken", true},
+    {1905, 409, "The share cannot be reached over FTP", false},
+    {1951, 409, "The SFTP port is taken", true},
 }};
 
 const Meaning& meaningOf(int code) {
@@ -50,7 +49,8 @@ std::string sentenceOf(const FieldError& error) {
     return error.field + ": expected " + error.expected + ".";
 }
 
-std::string detailOf(const Outcome& outcome, const Meaning& meaning, const std::vector<FieldError>& errors) {
+std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& meaning,
+                     const std::vector<FieldError>& errors) {
     std::string detail;
     append(detail, reasonIn(outcome.logLines));
     for (const FieldError& error : errors) {
@@ -62,19 +62,23 @@ std::string detailOf(const Outcome& outcome, const Meaning& meaning, const std::
     } else if (meaning.status == 500) {
         append(detail, outcome.platform.sentence);
     }
-    if (meaning.beforeAnyChange) {
-        append(detail, "Nothing was changed.");
+    if (!row.reads()) {
+        append(detail,
+               outcome.platform.changed ? "A part of the change may be in effect." : "Nothing was changed.");
     }
     return detail;
 }
 
-HttpResponse refused(const Outcome& outcome, const std::vector<FieldError>& errors,
+HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<FieldError>& errors,
                      const std::string& requestId) {
     const Meaning& meaning = meaningOf(outcome.code);
     Json::Value members(Json::objectValue);
     members["title"] = meaning.title;
     members["code"] = outcome.code;
-    members["detail"] = detailOf(outcome, meaning, errors);
+    members["detail"] = detailOf(row, outcome, meaning, errors);
+    if (!row.reads()) {
+        members["changed"] = outcome.platform.changed;
+    }
     for (const FieldError& error : errors) {
         Json::Value entry(Json::objectValue);
         entry["field"] = error.field;
@@ -95,7 +99,7 @@ HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outc
     case Outcome::Kind::success:
         return outcome.data.isNull() ? HttpResponse{204, "", "", {}} : jsonResponse(200, outcome.data);
     case Outcome::Kind::refused:
-        return refused(outcome,
+        return refused(row, outcome,
                        outcome.code == badParameter ? openApi.explain(row, parameters)
                                                     : std::vector<FieldError>{},
                        requestId);

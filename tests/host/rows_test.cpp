@@ -132,6 +132,22 @@ TEST_F(HostRows, AFailedOperationTellsThePlatformsSentence) {
               "Failed to get SFTP config. The file sftp.conf cannot be read: Permission denied.");
 }
 
+TEST_F(HostRows, AFailedChangeTellsWhetherAnythingWasChanged) {
+    platform.fail("VELTFTPTimeOutSet");
+    Json::Value problem =
+        post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"timeout":-5})").json();
+    EXPECT_EQ(problem["status"], 500);
+    // The fake does not say whether it failed before or after it stored something.
+    EXPECT_EQ(problem["changed"], true);
+    EXPECT_EQ(problem["detail"], "Failed to set FTP timeout. A part of the change may be in effect.");
+    platform.reset();
+    platform.fail("VELTFTPConfGet");
+    problem = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true})").json();
+    EXPECT_EQ(problem["changed"], false);
+    EXPECT_EQ(problem["detail"], "Failed to get FTP config. Nothing was changed.");
+    EXPECT_FALSE(get(ftp + "3/get").json().isMember("changed")) << "a read changes nothing anyway";
+}
+
 TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {
     const Answer answer = post(sftp + "set", R"({"enable":"yes"})");
     const std::string id = "request=" + answer.header("x-request-id") + " ";
