@@ -33,6 +33,7 @@ std::string messageOf(long status) {
     case 403:
         return "The server does not allow this";
     case 404:
+        return "The server does not have what was asked for";
     case 405:
         return "The server has no such method";
     case 408:
@@ -79,7 +80,7 @@ std::string hintOf(const HttpAnswer& answer, const Json::Value& problem, const E
         return accessHint(answer.status, endpoint);
     case 404:
     case 405:
-        return "'veltctl call --list' shows what the server can do.";
+        return "'veltctl call --list' shows the methods, 'veltctl tokens list' the tokens.";
     case 408:
     case 429:
         return "Try again in a moment.";
