@@ -13,7 +13,7 @@ namespace velt::host {
 
 namespace {
 
-constexpr int maxLimit = 500;
+constexpr int maxLimit = 1000;
 
 std::optional<unsigned> hexDigits(std::string_view text) {
     unsigned value = 0;
@@ -42,6 +42,11 @@ std::optional<std::uint32_t> eventNumber(const std::string& text) {
     const auto number = positiveNumber(text);
     return number && *number <= UINT32_MAX ? std::optional(static_cast<std::uint32_t>(*number))
                                            : std::nullopt;
+}
+
+bool isFilter(const std::string& key) {
+    constexpr std::array<const char*, 5> filters{"since", "event", "actor", "before", "limit"};
+    return std::find(filters.begin(), filters.end(), key) != filters.end();
 }
 
 /// Takes over one filter; returns what its value must be when it is not that, "" when all is well.
@@ -91,22 +96,21 @@ Json::Value toObject(const AdminLogEntry& entry) {
     return object;
 }
 
-std::optional<AdminLogQuery> parseLogQuery(const std::string& query, std::string& error) {
+std::optional<AdminLogQuery> parseLogQuery(const std::string& query, FieldError& error) {
     AdminLogQuery parsed;
     std::istringstream parts(query);
     for (std::string part; std::getline(parts, part, '&');) {
         const std::size_t equals = part.find('=');
-        const std::string key = part.substr(0, equals);
+        error.field = part.substr(0, equals);
         const auto value = queryValue(equals == std::string::npos ? "" : part.substr(equals + 1));
         if (!value) {
-            error = key + ": the value is not encoded as it must be";
+            error.expected = "a percent-encoded value in UTF-8";
             return std::nullopt;
         }
         // An empty filter does not narrow.
-        const std::string expected = value->empty() && !key.empty() ? "" : takeFilter(key, *value, parsed);
-        if (!expected.empty()) {
-            error = key;
-            error += ": expected " + expected;
+        const bool empty = value->empty() && isFilter(error.field);
+        error.expected = empty ? "" : takeFilter(error.field, *value, parsed);
+        if (!error.expected.empty()) {
             return std::nullopt;
         }
     }

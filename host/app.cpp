@@ -7,6 +7,7 @@
 #include "host/percent_encoding.h"
 #include "host/problem.h"
 #include "host/random_text.h"
+#include "host/services.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -193,7 +194,11 @@ HttpResponse App::callAndAnswer(const Job& job, const Row& row, const Json::Valu
     if (!row.reads() && !revision_.allows(job.request.ifMatch)) {
         return problem(412, "The settings have changed since they were read. Nothing was changed.", job.id);
     }
-    const Outcome outcome = callRow(row, parameters, job.principal);
+    Outcome outcome = callRow(row, parameters, job.principal);
+    if (!row.reads() && outcome.kind == Outcome::Kind::success) {
+        // A change that found nothing to do must not hide that an earlier one ended half-way.
+        outcome.down = startWhatIsDown(job.principal);
+    }
     HttpResponse response = answerFor(row, parameters, outcome, openApi_, job.id);
     metrics_.countRequest(row, outcome);
     logOutcome(job, row, outcome, response.status);
@@ -223,6 +228,9 @@ void App::logOutcome(const Job& job, const Row& row, const Outcome& outcome, int
     if (!outcome.platform.sentence.empty()) {
         log_.write(job.id, "platform: " + outcome.platform.sentence);
     }
+    if (!outcome.down.empty()) {
+        log_.write(job.id, sentenceOf(outcome.down));
+    }
     log_.write(job.id, row.name() + " for " + job.principal.actor + " at " + job.principal.address + ": " +
                            std::to_string(status) + " in " + milliseconds(outcome.seconds));
 }
@@ -232,6 +240,9 @@ void App::run(const JobPointer& job, RequestOrder::Kind kind, std::function<Http
         HttpResponse response;
         try {
             response = answer();
+        } catch (const TokenError& error) {
+            log_.write(job->id, error.what());
+            response = problem(500, error.what(), job->id);
         } catch (const std::exception& error) {
             log_.write(job->id, std::string("internal error: ") + error.what());
             response = problem(500, "The host failed. Its log has more under this request's id.", job->id);

@@ -85,9 +85,6 @@ private:
     HttpResponse createToken(const Job& job);
     HttpResponse deleteToken(const Job& job);
 
-    /// {"name", "enabled", "port"} of each service, from the modules' own answers.
-    Json::Value services(const Principal& principal);
-
     const ModuleTable& table_;
     HostLog& log_;
     const std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();

@@ -2,6 +2,7 @@
 
 #include "host/module_log.h"
 #include "host/problem.h"
+#include "host/services.h"
 
 #include <algorithm>
 #include <array>
@@ -49,6 +50,17 @@ std::string sentenceOf(const FieldError& error) {
     return error.field + ": expected " + error.expected + ".";
 }
 
+/// How far a change got that the module has refused.
+std::string extentOf(const PlatformReport& platform) {
+    if (!platform.changed) {
+        return "Nothing was changed.";
+    }
+    if (!platform.stored) {
+        return "";
+    }
+    return platform.storeFailed ? "Some of the new settings are stored." : "The new settings are stored.";
+}
+
 std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& meaning,
                      const std::vector<FieldError>& errors) {
     std::string detail;
@@ -59,12 +71,11 @@ std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& mean
     if (meaning.portTaken && !outcome.platform.holder.empty()) {
         append(detail, "Port " + std::to_string(outcome.platform.port) + " is held by " +
                            outcome.platform.holder + ".");
-    } else if (meaning.status == 500) {
+    } else {
         append(detail, outcome.platform.sentence);
     }
     if (!row.reads()) {
-        append(detail,
-               outcome.platform.changed ? "A part of the change may be in effect." : "Nothing was changed.");
+        append(detail, extentOf(outcome.platform));
     }
     return detail;
 }
@@ -80,15 +91,24 @@ HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<F
         members["changed"] = outcome.platform.changed;
     }
     for (const FieldError& error : errors) {
-        Json::Value entry(Json::objectValue);
-        entry["field"] = error.field;
-        entry["expected"] = error.expected;
-        members["errors"].append(entry);
+        members["errors"].append(toObject(error));
     }
     if (meaning.portTaken && !outcome.platform.holder.empty()) {
         members["holder"] = outcome.platform.holder;
     }
     return problemWith(meaning.status, std::move(members), requestId);
+}
+
+/// The module is content, but what is switched on does not run.
+HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["title"] = "A service that is switched on does not run";
+    members["detail"] =
+        "What was asked for is stored, but a service does not follow. " + sentenceOf(outcome.down);
+    for (const ServiceDown& each : outcome.down) {
+        members["down"].append(toObject(each));
+    }
+    return problemWith(500, std::move(members), requestId);
 }
 
 } // namespace
@@ -97,6 +117,9 @@ HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outc
                        const OpenApi& openApi, const std::string& requestId) {
     switch (outcome.kind) {
     case Outcome::Kind::success:
+        if (!outcome.down.empty()) {
+            return serviceDown(outcome, requestId);
+        }
         return outcome.data.isNull() ? HttpResponse{204, "", "", {}} : jsonResponse(200, outcome.data);
     case Outcome::Kind::refused:
         return refused(row, outcome,

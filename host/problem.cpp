@@ -53,6 +53,21 @@ HttpResponse problemWith(int status, Json::Value members, const std::string& req
     return response;
 }
 
+HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
+                          const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["detail"] = error.field + ": expected " + error.expected + "." + extent;
+    members["errors"].append(toObject(error));
+    return problemWith(status, std::move(members), requestId);
+}
+
+Json::Value toObject(const FieldError& error) {
+    Json::Value object(Json::objectValue);
+    object["field"] = error.field;
+    object["expected"] = error.expected;
+    return object;
+}
+
 HttpResponse jsonResponse(int status, const Json::Value& value) {
     return {status, "application/json", toJson(value), {}};
 }

@@ -306,6 +306,9 @@ TEST_F(HostAccess, ADamagedTokenFileStopsTheStart) {
         std::ofstream(settings.tokenFile) << text;
         EXPECT_THROW(start(), velt::host::TokenError) << text;
     }
+    std::filesystem::remove(settings.tokenFile);
+    std::filesystem::create_directories(settings.tokenFile);
+    EXPECT_THROW(start(), velt::host::TokenError) << "a folder";
 }
 
 TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
@@ -313,7 +316,10 @@ TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
     const auto parent = settings.tokenFile.parent_path();
     std::filesystem::remove_all(parent);
     std::ofstream(parent) << "in the way";
-    EXPECT_EQ(post("/api/tokens", R"({"name":"x","role":"admin"})").status, 500);
+    const Answer answer = post("/api/tokens", R"({"name":"x","role":"admin"})");
+    EXPECT_EQ(answer.status, 500);
+    EXPECT_EQ(answer.json()["detail"],
+              "The file of tokens " + settings.tokenFile.string() + " cannot be written: Not a directory.");
     EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
 }
 

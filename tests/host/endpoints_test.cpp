@@ -104,10 +104,35 @@ TEST_F(HostEndpoints, TheLogIsFiltered) {
 
 TEST_F(HostEndpoints, AFilterThatIsNoneIsRefused) {
     start();
-    for (const char* query : {"?limit=0", "?limit=501", "?limit=x", "?before=-1", "?event=0xZZ",
-                              "?since=yesterday", "?actor=%zz", "?actor=%", "?actor=%ff", "?unknown=1"}) {
-        EXPECT_EQ(get(std::string("/api/log") + query).status, 400) << query;
+    const std::map<std::string, std::string> wrong{
+        {"limit=0", "limit"},         {"limit=1001", "limit"},
+        {"limit=x", "limit"},         {"limit=9999999999", "limit"},
+        {"before=-1", "before"},      {"before=1.5", "before"},
+        {"event=0xZZ", "event"},      {"event=4294967296", "event"},
+        {"since=yesterday", "since"}, {"actor=%zz", "actor"},
+        {"actor=%", "actor"},         {"actor=%ff", "actor"},
+        {"unknown=1", "unknown"},     {"unknown=", "unknown"},
+        {"limit=5&Limit=5", "Limit"}, {"=1", ""},
+    };
+    for (const auto& [query, field] : wrong) {
+        const Answer answer = get("/api/log?" + query);
+        EXPECT_EQ(answer.status, 400) << query;
+        ASSERT_EQ(answer.json()["errors"].size(), 1U) << query;
+        EXPECT_EQ(answer.json()["errors"][0]["field"], field) << query;
+        EXPECT_EQ(answer.json()["detail"].asString(),
+                  field + ": expected " + answer.json()["errors"][0]["expected"].asString() + ".");
     }
+    EXPECT_EQ(get("/api/log?limit=1001").json()["errors"][0]["expected"], "a number from 1 to 1000");
+}
+
+TEST_F(HostEndpoints, APageHoldsAsManyAsTheLogGivesAtOnce) {
+    start();
+    addEntries(1001);
+    const Json::Value page = get("/api/log?limit=1000").json();
+    EXPECT_EQ(page["entries"].size(), 1000U);
+    EXPECT_EQ(page["next"], 2);
+    EXPECT_EQ(ids("?limit=1000&before=2"), std::vector<int>{1});
+    EXPECT_EQ(access.largestLimit, 1000);
 }
 
 TEST_F(HostEndpoints, ALogThatCannotBeReadIsAFailure) {

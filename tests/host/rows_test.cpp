@@ -114,6 +114,16 @@ TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
     EXPECT_EQ(other.json()["code"], 1951);
 }
 
+TEST_F(HostRows, APortThatNobodyHoldsIsRefusedInThePlatformsWords) {
+    platform.takenPorts["ssh"] = {0};
+    access.sentence = "The port 0 is not one from 1 to 65535.";
+    const Answer answer = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":0})");
+    EXPECT_EQ(answer.status, 409);
+    EXPECT_FALSE(answer.json().isMember("holder"));
+    EXPECT_EQ(answer.json()["detail"],
+              "Port conflict. The port 0 is not one from 1 to 65535. Nothing was changed.");
+}
+
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {
     access.holder = "what an earlier request of the thread found";
     const Answer answer = post(security + "set", R"({"anonymous_chroot":true,"anonymous_chroot_share":"x"})");
@@ -132,20 +142,29 @@ TEST_F(HostRows, AFailedOperationTellsThePlatformsSentence) {
               "Failed to get SFTP config. The file sftp.conf cannot be read: Permission denied.");
 }
 
-TEST_F(HostRows, AFailedChangeTellsWhetherAnythingWasChanged) {
-    platform.fail("VELTFTPTimeOutSet");
-    Json::Value problem =
-        post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"timeout":-5})").json();
-    EXPECT_EQ(problem["status"], 500);
-    // The fake does not say whether it failed before or after it stored something.
-    EXPECT_EQ(problem["changed"], true);
-    EXPECT_EQ(problem["detail"], "Failed to set FTP timeout. A part of the change may be in effect.");
+TEST_F(HostRows, AFailureTellsHowFarTheChangeGot) {
+    const auto detail = [this] {
+        const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+        EXPECT_EQ(answer.status, 500);
+        EXPECT_EQ(answer.json()["code"], 1902);
+        return answer.json()["detail"].asString();
+    };
+    platform.fail("VELTSFTPConfigGet");
+    EXPECT_EQ(detail(), "Failed to get SFTP config. Nothing was changed.");
     platform.reset();
-    platform.fail("VELTFTPConfGet");
-    problem = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true})").json();
-    EXPECT_EQ(problem["changed"], false);
-    EXPECT_EQ(problem["detail"], "Failed to get FTP config. Nothing was changed.");
-    EXPECT_FALSE(get(ftp + "3/get").json().isMember("changed")) << "a read changes nothing anyway";
+    platform.fail("VLIBServiceStart");
+    access.sentence = "The SFTP daemon does not start: bad luck.";
+    const std::string started = detail();
+    EXPECT_TRUE(started.ends_with(" The SFTP daemon does not start: bad luck. The new settings are stored."))
+        << started;
+    platform.reset();
+    access.storeFailed = true;
+    platform.fail("VLIBServiceStart");
+    EXPECT_TRUE(detail().ends_with(" Some of the new settings are stored."));
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":2222})").json()["changed"], true);
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":0})").json()["changed"], false);
+    platform.fail("VELTSFTPConfigGet");
+    EXPECT_FALSE(get(sftp + "get").json().isMember("changed")) << "a read changes nothing anyway";
 }
 
 TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {
@@ -274,31 +293,6 @@ TEST_F(HostRows, TheRowsAreListed) {
     EXPECT_EQ(reads, 8);
 }
 
-TEST_F(HostRows, StatusComesFromTheModulesAnswers) {
-    platform.services["ftpd"] = 1;
-    platform.sftp.port = 2022;
-    const Json::Value status = get("/api/status").json();
-    EXPECT_EQ(status["services"][0]["name"], "ftp");
-    EXPECT_EQ(status["services"][0]["enabled"], true);
-    EXPECT_EQ(status["services"][0]["port"], 21);
-    EXPECT_EQ(status["services"][1]["enabled"], false);
-    EXPECT_EQ(status["services"][2]["name"], "sftp");
-    EXPECT_EQ(status["services"][2]["port"], 2022);
-    EXPECT_EQ(get("/healthz").json()["status"], "ok");
-}
-
-TEST_F(HostRows, StatusTellsWhatIsStoredBesideWhatRuns) {
-    platform.conf.service_flags = 2;
-    platform.sftp.enable = 1;
-    platform.sftpAlive = 0;
-    const Json::Value services = get("/api/status").json()["services"];
-    EXPECT_EQ(services[0]["wanted"], false);
-    EXPECT_EQ(services[1]["wanted"], true);
-    EXPECT_EQ(services[1]["enabled"], false);
-    EXPECT_EQ(services[2]["wanted"], true);
-    EXPECT_EQ(services[2]["enabled"], false);
-}
-
 TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
     const std::string seen = get(sftp + "get").header("etag");
     EXPECT_EQ(get(ftp + "3/get").header("etag"), seen) << "reading changes nothing";
@@ -318,23 +312,6 @@ TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
     EXPECT_EQ(ask("POST", sftp + "set", ifNow, R"({"enable":true,"portnum":2223})").status, 204);
     EXPECT_EQ(ask("POST", sftp + "set", admin + "If-Match: *\r\n", R"({"enable":true,"portnum":22})").status,
               204);
-}
-
-TEST_F(HostRows, MetricsCountRequestsByRowAndOutcome) {
-    platform.services["ftpd"] = 1;
-    get(ftp + "3/get");
-    post(sftp + "set", "{}");
-    post(sftp + "set", R"({"enable":true})");
-    const std::string text = get("/metrics").body;
-    for (
-        const char* line :
-        {R"(velt_requests_total{api="VELT.Core.FileServ.FTP",method="get",outcome="success",version="3"} 1)",
-         R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="1901",version="1"} 1)",
-         R"(velt_service_up{service="ftp"} 1)", R"(velt_service_up{service="ftps"} 0)",
-         R"(velt_service_up{service="sftp"} 1)", R"(velt_daemon_starts_total{service="sftp"} 1)",
-         "velt_request_duration_seconds_bucket"}) {
-        EXPECT_NE(text.find(line), std::string::npos) << line << "\n" << text;
-    }
 }
 
 } // namespace
