@@ -161,6 +161,8 @@ TEST_F(HostRows, AFailureTellsHowFarTheChangeGot) {
     access.storeFailed = true;
     platform.fail("VLIBServiceStart");
     EXPECT_TRUE(detail().ends_with(" Some of the new settings are stored."));
+    platform.reset();
+    platform.fail("VLIBServiceStart");
     EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":2222})").json()["changed"], true);
     EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":0})").json()["changed"], false);
     platform.fail("VELTSFTPConfigGet");
