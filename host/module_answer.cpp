@@ -71,7 +71,7 @@ std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& mean
     if (meaning.portTaken && !outcome.platform.holder.empty()) {
         append(detail, "Port " + std::to_string(outcome.platform.port) + " is held by " +
                            outcome.platform.holder + ".");
-    } else if (meaning.status == 500) {
+    } else {
         append(detail, outcome.platform.sentence);
     }
     if (!row.reads()) {
@@ -87,6 +87,9 @@ HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<F
     members["title"] = meaning.title;
     members["code"] = outcome.code;
     members["detail"] = detailOf(row, outcome, meaning, errors);
+    if (!row.reads()) {
+        members["changed"] = outcome.platform.changed;
+    }
     for (const FieldError& error : errors) {
         members["errors"].append(toObject(error));
     }

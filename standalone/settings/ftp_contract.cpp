@@ -30,6 +30,10 @@ int noPlaceFor(const char* what) {
     return fail(ErrorNumber::invalid, std::string("There is no place for ") + what + ".");
 }
 
+bool isBlank(std::string_view text) {
+    return text.find_first_not_of(" \t") == std::string_view::npos;
+}
+
 int writeSystemInformation(std::string_view key, std::string_view value) {
     const StateLock lock;
     if (!lock)
@@ -109,8 +113,9 @@ int VLIBCINFOSetKeyValue(const char* key, const char* value) {
     if (key == nullptr || value == nullptr)
         return velt::fail(velt::ErrorNumber::invalid, "There is no key or no value to write.");
     return velt::atBoundary([&] {
+        // A blank stands for no address: whoever may not write an empty text can still take the address away.
         if (key == velt::externalAddressKey)
-            return velt::changeExternalAddress(value);
+            return velt::changeExternalAddress(velt::isBlank(value) ? "" : value);
         return velt::writeSystemInformation(key, value);
     });
 }

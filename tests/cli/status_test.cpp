@@ -26,6 +26,12 @@ TEST_F(StatusTest, TheServicesAreShown) {
                           "sftp     on     2222\n");
 }
 
+TEST_F(StatusTest, AServiceThatIsSwitchedOnAndDoesNotRunIsDown) {
+    answer(R"({"version": "1.0.0", "uptime_seconds": 1, "services": [
+        {"name": "sftp", "enabled": false, "wanted": true, "port": 22}]})");
+    EXPECT_EQ(run({"status"}).out, "veltd 1.0.0, up for 1 s\n\nSERVICE  STATE  PORT\nsftp     down   22\n");
+}
+
 TEST_F(StatusTest, ProgramsGetTheServersObject) {
     answer(status);
     EXPECT_EQ(jsonOf(run({"status", "--json"}).out), jsonOf(status));

@@ -125,6 +125,16 @@ TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
     }
 }
 
+TEST_F(HostRows, APortThatNobodyHoldsIsRefusedInThePlatformsWords) {
+    platform.takenPorts["ssh"] = {0};
+    access.sentence = "The port 0 is not one from 1 to 65535.";
+    const Answer answer = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":0})");
+    EXPECT_EQ(answer.status, 409);
+    EXPECT_FALSE(answer.json().isMember("holder"));
+    EXPECT_EQ(answer.json()["detail"],
+              "Port conflict. The port 0 is not one from 1 to 65535. Nothing was changed.");
+}
+
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {
     access.holder = "what an earlier request of the thread found";
     const Answer answer = post(security + "set", R"({"anonymous_chroot":true,"anonymous_chroot_share":"x"})");
@@ -162,6 +172,12 @@ TEST_F(HostRows, AFailureTellsHowFarTheChangeGot) {
     access.storeFailed = true;
     platform.fail("VLIBServiceStart");
     EXPECT_TRUE(detail().ends_with(" Some of the new settings are stored."));
+    platform.reset();
+    platform.fail("VLIBServiceStart");
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":2222})").json()["changed"], true);
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":0})").json()["changed"], false);
+    platform.fail("VELTSFTPConfigGet");
+    EXPECT_FALSE(get(sftp + "get").json().isMember("changed")) << "a read changes nothing anyway";
 }
 
 TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {
