@@ -101,6 +101,7 @@ HttpResponse App::metrics(const Job& job) {
     for (const auto& [daemon, restarts] : daemonRestarts()) {
         metrics_.setDaemonRestarts(daemon, restarts);
     }
+    metrics_.setEventReaders(events_.readers());
     return {200, "text/plain; version=0.0.4; charset=utf-8", metrics_.text(), {}};
 }
 

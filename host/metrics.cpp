@@ -17,7 +17,7 @@ namespace {
 const prometheus::Histogram::BucketBoundaries durations{0.001, 0.003, 0.01, 0.03, 0.1, 0.3, 1, 3, 10, 30};
 
 std::map<std::string, std::string> labelsOf(const Row& row, const Outcome& outcome) {
-    std::string result = outcome.down.empty() ? "success" : "service down";
+    std::string result = outcome.down.empty() ? "success" : "service_down";
     if (outcome.kind != Outcome::Kind::success) {
         result = outcome.kind == Outcome::Kind::refused ? std::to_string(outcome.code) : "defect";
     }
@@ -59,6 +59,11 @@ struct Metrics::Families {
             .Name("velt_daemon_restarts_total")
             .Help("Starts of a daemon after it had ended by itself")
             .Register(registry);
+    prometheus::Gauge& eventReaders = prometheus::BuildGauge()
+                                          .Name("velt_event_readers")
+                                          .Help("Open streams of events")
+                                          .Register(registry)
+                                          .Add({});
     std::mutex mutex;
     std::map<std::string, std::uint64_t> seenRestarts;
 };
@@ -93,6 +98,10 @@ void Metrics::setDaemonRestarts(const std::string& daemon, std::uint64_t count) 
 
 void Metrics::countDaemonStart(const std::string& service) {
     families_->starts.Add({{"service", service}}).Increment();
+}
+
+void Metrics::setEventReaders(std::size_t count) {
+    families_->eventReaders.Set(static_cast<double>(count));
 }
 
 std::string Metrics::text() const {

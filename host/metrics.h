@@ -5,6 +5,7 @@
 
 #include "host/module_call.h"
 
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -19,7 +20,7 @@ public:
     Metrics(const Metrics&) = delete;
     Metrics& operator=(const Metrics&) = delete;
 
-    /// Counts a served request under "success", the module's code, "service down" or "defect".
+    /// Counts a served request under "success", the module's code, "service_down" or "defect".
     void countRequest(const Row& row, const Outcome& outcome);
 
     /// Counts an answer that no module had a part in, by its status.
@@ -33,6 +34,8 @@ public:
     /// Takes over how often a daemon was started again after it had ended by itself, as counted elsewhere:
     /// from 0 since some earlier moment.
     void setDaemonRestarts(const std::string& daemon, std::uint64_t count);
+
+    void setEventReaders(std::size_t count);
 
     /// The text format of Prometheus.
     std::string text() const;

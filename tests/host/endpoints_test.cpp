@@ -2,6 +2,7 @@
 
 #include "host/admin_log_json.h"
 #include "host/clock.h"
+#include "host/event_hub.h"
 #include "tests/host/fake_access.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -200,6 +201,38 @@ TEST_F(HostEndpoints, AReaderThatLeavesIsForgotten) {
     }
     EXPECT_EQ(server->connections(), 0U);
     access.observer.serviceAction("ftpd", "start");
+}
+
+TEST(Events, ReadersThatLeaveBeforeAnyEventAreForgotten) {
+    class Reader : public velt::host::EventReader {
+    public:
+        void deliver(const std::shared_ptr<const std::string>& event) override { last = *event; }
+        std::string last;
+    };
+    velt::host::EventHub hub;
+    const auto stays = std::make_shared<Reader>();
+    hub.add(stays);
+    const std::weak_ptr<Reader> leaves = [&hub] {
+        const auto reader = std::make_shared<Reader>();
+        hub.add(reader);
+        EXPECT_EQ(hub.readers(), 2U);
+        return reader;
+    }();
+    EXPECT_TRUE(leaves.expired());
+    const auto next = std::make_shared<Reader>();
+    hub.add(next);
+    EXPECT_EQ(leaves.use_count(), 0);
+    EXPECT_EQ(hub.readers(), 2U);
+    hub.publish("type", Json::Value(7));
+    EXPECT_EQ(stays->last, "event: type\ndata: 7\n\n");
+    EXPECT_EQ(next->last, stays->last);
+}
+
+TEST_F(HostEndpoints, StreamsOfEventsAreCounted) {
+    start();
+    EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 0\n"), std::string::npos);
+    const Client events = listen();
+    EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 1\n"), std::string::npos);
 }
 
 TEST_F(HostEndpoints, AReaderThatLagsIsLeftBehind) {

@@ -95,23 +95,34 @@ TEST_F(HostRows, ARangeWithoutItsPortsIsExplained) {
 
 TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
     platform.takenPorts["ssh"] = {2121, 40000};
-    access.holder = "the SFTP service";
-    access.port = 2121;
-    const Answer control = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":2121})");
-    EXPECT_EQ(control.status, 409);
-    EXPECT_EQ(control.json()["code"], 1903);
-    EXPECT_EQ(control.json()["holder"], "the SFTP service");
-    EXPECT_EQ(control.json()["detail"],
-              "Port conflict. Port 2121 is held by the SFTP service. Nothing was changed.");
-    const Answer range = post(
-        ftp + "3/set",
-        R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true,"custom_port":"39999:40001"})");
-    EXPECT_EQ(range.status, 409);
-    EXPECT_EQ(range.json()["code"], 1904);
     platform.takenPorts["ftp"] = {2222};
-    const Answer other = post(sftp + "set", R"({"enable":true,"portnum":2222})");
-    EXPECT_EQ(other.status, 409);
-    EXPECT_EQ(other.json()["code"], 1951);
+    struct Conflict {
+        std::string target;
+        const char* body;
+        int port;
+        int code;
+        const char* title;
+    };
+    const std::string range =
+        R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true,"custom_port":"39999:40001"})";
+    for (const Conflict& each : std::vector<Conflict>{
+             {ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":2121})", 2121, 1903,
+              "The FTP port is taken"},
+             {ftp + "3/set", range.c_str(), 40000, 1904, "The passive port range is taken"},
+             {sftp + "set", R"({"enable":true,"portnum":2222})", 2222, 1951, "The SFTP port is taken"}}) {
+        access.holder = "nginx (process 812)";
+        access.port = each.port;
+        const Answer answer = post(each.target, each.body);
+        EXPECT_EQ(answer.status, 409);
+        const Json::Value problem = answer.json();
+        EXPECT_EQ(problem["code"], each.code);
+        EXPECT_EQ(problem["title"], each.title);
+        EXPECT_EQ(problem["holder"], "nginx (process 812)");
+        const std::string detail = problem["detail"].asString();
+        EXPECT_TRUE(detail.ends_with(" Port " + std::to_string(each.port) +
+                                     " is held by nginx (process 812). Nothing was changed."))
+            << detail;
+    }
 }
 
 TEST_F(HostRows, APortThatNobodyHoldsIsRefusedInThePlatformsWords) {

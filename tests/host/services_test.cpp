@@ -50,7 +50,7 @@ TEST_F(HostServices, AChangeIsNotDoneWhileAServiceIsDown) {
             logged("request=" + problem["request_id"].asString() + " The FTP service does not run. The FTP"));
     }
     EXPECT_TRUE(measured(
-        R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="service down",version="1"} 2)"));
+        R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="service_down",version="1"} 2)"));
 }
 
 TEST_F(HostServices, AChangeThatGetsTheServiceUpIsDone) {
