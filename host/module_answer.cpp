@@ -105,6 +105,7 @@ HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
     members["title"] = "A service that is switched on does not run";
     members["detail"] =
         "What was asked for is stored, but a service does not follow. " + sentenceOf(outcome.down);
+    members["changed"] = outcome.platform.changed;
     for (const ServiceDown& each : outcome.down) {
         members["down"].append(toObject(each));
     }

@@ -8,7 +8,6 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/services/daemon_control.h"
-#include "standalone/services/service_backend.h"
 #include "standalone/services/services.h"
 #include "standalone/settings/settings.h"
 #include "standalone/standalone.h"
@@ -93,7 +92,7 @@ ServiceState serviceState(const std::string& service) {
 std::uint64_t daemonRestarts(const std::string& service) {
     const LastErrorKept kept;
     const auto daemon = daemonOf(service.c_str());
-    return daemon ? makeServiceBackend(daemonName(*daemon))->restarts() : 0;
+    return daemon ? daemonState(*daemon).restarts : 0;
 }
 
 } // namespace velt

@@ -5,7 +5,6 @@
 #include "standalone/daemon_plan.h"
 #include "standalone/supervise/service_state.h"
 
-#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -29,9 +28,6 @@ public:
     virtual int stop() = 0;
 
     virtual ServiceState state() const = 0;
-
-    /// How often the daemon was started again after it had ended by itself, since this was counted anew.
-    virtual std::uint64_t restarts() const = 0;
 };
 
 /// The backend for the daemon "ftpd" or "sftp" on this machine.

@@ -111,10 +111,6 @@ ServiceState SuperviseBackend::state() const {
     return readServiceState(stateFile(statePath("/run/velt"), daemon_)).value_or(ServiceState{});
 }
 
-std::uint64_t SuperviseBackend::restarts() const {
-    return state().restarts;
-}
-
 int SuperviseBackend::start(const DaemonPlan& plan) {
     const std::filesystem::path directory = runDirectory();
     if (directory.empty()) {

@@ -14,7 +14,6 @@ public:
     int pause() override;
     int stop() override;
     ServiceState state() const override;
-    std::uint64_t restarts() const override;
 
 private:
     int launchSupervisor(const std::filesystem::path& directory, const DaemonPlan& plan) const;

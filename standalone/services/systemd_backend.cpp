@@ -62,13 +62,6 @@ ServiceState SystemdBackend::state() const {
     return state;
 }
 
-std::uint64_t SystemdBackend::restarts() const {
-    const std::string text = property("NRestarts");
-    std::uint64_t count = 0;
-    std::from_chars(text.data(), text.data() + text.size(), count);
-    return count;
-}
-
 int SystemdBackend::start(const DaemonPlan& plan) {
     const auto deadline = Clock::now() + startLimit;
     const ServiceState now = state();

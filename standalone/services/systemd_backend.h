@@ -28,7 +28,6 @@ public:
     int pause() override;
     int stop() override;
     ServiceState state() const override;
-    std::uint64_t restarts() const override;
 
 private:
     using Clock = std::chrono::steady_clock;

@@ -241,10 +241,10 @@ void Supervisor::publish(RunState state, std::string reason) {
     record.daemon = daemon_.id();
     record.configurationHash = order_.configurationHash;
     record.ports = order_.ports;
+    record.restarts = restarts_;
     record.sessions = descendantsOf(::getpid());
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);
-    record.restarts = restarts_;
     if (!writeServiceState(stateFile(directory_, service_), record)) {
         ::syslog(LOG_ERR, "the state of %s cannot be written: %s", service_.c_str(), std::strerror(errno));
     }

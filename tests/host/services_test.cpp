@@ -45,6 +45,7 @@ TEST_F(HostServices, AChangeIsNotDoneWhileAServiceIsDown) {
             "What was asked for is stored, but a service does not follow. The FTP service does not run. The "
             "FTP daemon does not start: no luck.");
         EXPECT_EQ(problem["down"][0]["service"], "ftp");
+        EXPECT_EQ(problem["changed"], i == 1);
         EXPECT_EQ(access.starts, i) << "each change tries to start it";
         EXPECT_TRUE(
             logged("request=" + problem["request_id"].asString() + " The FTP service does not run. The FTP"));
