@@ -61,9 +61,6 @@ ProcessResult sftp(int atPort, const std::string& commands, const std::string& s
 /// Whether alice can fetch the large file.
 bool servesSftp(int atPort);
 
-/// What still runs in this world beside the test, by command, after three seconds at most for ending.
-std::string lastingProcesses();
-
 } // namespace velt::test
 
 #endif

@@ -1,6 +1,6 @@
 #include "tests/system/support/host_service.h"
 
-#include "tests/system/support/daemon_process.h"
+#include "tests/system/support/leftovers.h"
 
 #include <json/reader.h>
 #include <json/writer.h>
@@ -62,8 +62,7 @@ void HostService::TearDown() {
     }
     EXPECT_EQ(lastingProcesses(), "");
     EXPECT_EQ(readFileText("/proc/self/mounts"), mounts_);
-    EXPECT_FALSE(contains(readFileText("/proc/net/tcp") + readFileText("/proc/net/tcp6"), " 0A "))
-        << "something listens";
+    EXPECT_FALSE(somethingListens());
     clearFolders();
     fs::remove(logFile);
 }
