@@ -16,6 +16,7 @@ namespace velt::cli {
 namespace {
 
 constexpr int defaultPage = 50;
+constexpr int largestPage = 1000;
 
 struct LogOptions {
     std::string since;
@@ -181,8 +182,8 @@ void addLogCommand(CLI::App& app, Command& chosen) {
     CLI::Option* before =
         log->add_option("--before", options->before, "Entries older than the one with this id")
             ->type_name("ID");
-    log->add_option("--limit", options->limit, "Entries per page, 1 to 500 (default 50)")
-        ->check(CLI::Range(1, 500))
+    log->add_option("--limit", options->limit, "Entries per page, 1 to 1000 (default 50)")
+        ->check(CLI::Range(1, largestPage))
         ->type_name("N");
     CLI::Option* all = log->add_flag("--all", options->all, "All pages, not only one");
     log->add_flag("-f,--follow", options->follow,

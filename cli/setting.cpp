@@ -175,7 +175,7 @@ Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::s
             throw Failure(ExitCode::usage, "\"" + word.substr(equals + 1) + "\" is no value for " + key + ".",
                           "Give " + std::string(describe(setting->type)) + ".");
         }
-        if (key == "custom_port" && *value == "") {
+        if (key == "custom_port" && value->asString().empty()) {
             throw Failure(ExitCode::usage, "custom_port cannot be empty.",
                           "Give FIRST:LAST, or custom_port_range=off for the default range.");
         }
@@ -195,7 +195,7 @@ Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted,
         completePassiveRange(change, current);
     }
     // The server takes no empty address, but one that is blank it keeps as none.
-    if (change.isMember("ext_ip") && change["ext_ip"] == "") {
+    if (change.isMember("ext_ip") && change["ext_ip"].asString().empty()) {
         change["ext_ip"] = " ";
     }
     return change;

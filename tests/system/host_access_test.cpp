@@ -180,7 +180,7 @@ TEST_F(HostDoor, whatIsNoHttpGetsNoFurtherEither) {
     for (const std::string& text :
          {std::string("GET /api/status\r\n\r\n"), std::string("GET /api/status HTTP/1.1\r\n\r\n"),
           std::string("GET /api/status HTTP/9.9\r\nHost: localhost\r\n\r\n"),
-          std::string("GET /api/status\0 HTTP/1.1\r\nHost: localhost\r\n\r\n", 54),
+          "GET /api/status" + std::string(1, '\0') + " HTTP/1.1\r\nHost: localhost\r\n\r\n",
           std::string("GET http://localhost/api/status HTTP/1.1\r\nHost: localhost\r\n\r\n"),
           std::string("CONNECT localhost:22 HTTP/1.1\r\nHost: localhost\r\n\r\n"),
           std::string("OPTIONS * HTTP/1.1\r\nHost: localhost\r\n\r\n"),

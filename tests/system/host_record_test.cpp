@@ -181,6 +181,7 @@ TEST_F(HostRecord, aServiceThatIsDownStaysSwitchedOnWhenAnotherSettingChanges) {
     {
         const UniqueFd other = listenOn(2222);
         startHost();
+        EXPECT_EQ(fetchHome(), "alice") << "started by the new host";
         const ProcessResult status = veltctl({"status"});
         EXPECT_TRUE(contains(status.output, "sftp     down   2222")) << status.output;
         EXPECT_EQ(jsonOf(exported())["sftp"]["enable"], true);

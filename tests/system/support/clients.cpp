@@ -7,14 +7,11 @@
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <cctype>
 #include <chrono>
 #include <sstream>
-#include <thread>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -29,22 +26,6 @@ const std::string utf8 = "gr\xc3\xbc\xc3\x9f";
 
 double secondsSince(Clock::time_point start) {
     return std::chrono::duration<double>(Clock::now() - start).count();
-}
-
-// What still runs in this world beside the test, by command.
-std::string processesLeft() {
-    // Whoever loses its parent here becomes the test's child.
-    while (waitpid(-1, nullptr, WNOHANG) > 0) {
-    }
-    std::string left;
-    for (const auto& entry : fs::directory_iterator("/proc")) {
-        const std::string name = entry.path().filename();
-        if (std::ranges::all_of(name, [](unsigned char c) { return std::isdigit(c) != 0; }) &&
-            std::stoi(name) != getpid()) {
-            left += name + " " + readFileText(entry.path() / "comm");
-        }
-    }
-    return left;
 }
 
 } // namespace
@@ -66,7 +47,8 @@ void makeShares() {
         writeFile(folder / "about", name);
         const char* grant = name == "public" ? "read" : name == "upload" ? "write" : "none";
         text += (text.empty() ? "" : ",") + (R"({"name": ")" + name) + R"(", "path": ")" + folder.string() +
-                R"(", "ftp": true, "users": {"ftp": ")" + grant + R"("}})";
+                R"(", "ftp": true, "users": {"ftp": ")" + grant +
+                R"(", "alice": "write", "bob": "write", "carol": "write"}})";
     }
     fs::create_directories(worldRoot / "etc/velt");
     writeFile(worldRoot / "etc/velt/shares.json", R"({"version": 1, "shares": [)" + text + "]}\n");
@@ -194,16 +176,6 @@ ProcessResult sftp(int atPort, const std::string& commands, const std::string& s
 bool servesSftp(int atPort) {
     const bool done = sftp(atPort, "get large /mnt/srv/got\n").exitCode == 0;
     return done && fs::file_size("/mnt/srv/got") == largeSize;
-}
-
-std::string lastingProcesses() {
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(3);
-    std::string left = processesLeft();
-    while (!left.empty() && std::chrono::steady_clock::now() < deadline) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-        left = processesLeft();
-    }
-    return left;
 }
 
 } // namespace velt::test

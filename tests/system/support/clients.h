@@ -19,7 +19,8 @@ inline constexpr int ftpTestPort = 2121;
 bool contains(const std::string& text, const std::string& part);
 
 /// Writes the file of the shares: "public" (anonymous users read it), "music", "upload" (they write) and
-/// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name.
+/// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name. Alice, bob
+/// and carol may write in all of them.
 void makeShares();
 
 /// What alice gets when she fetches the file of her home; "" when she is refused.
@@ -59,9 +60,6 @@ void furnishSftp();
 ProcessResult sftp(int atPort, const std::string& commands, const std::string& speed = "1000000");
 /// Whether alice can fetch the large file.
 bool servesSftp(int atPort);
-
-/// What still runs in this world beside the test, by command, after three seconds at most for ending.
-std::string lastingProcesses();
 
 } // namespace velt::test
 

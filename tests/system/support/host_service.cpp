@@ -1,6 +1,6 @@
 #include "tests/system/support/host_service.h"
 
-#include "tests/system/support/daemon_process.h"
+#include "tests/system/support/leftovers.h"
 
 #include <json/reader.h>
 #include <json/writer.h>
@@ -62,18 +62,17 @@ void HostService::TearDown() {
     }
     EXPECT_EQ(lastingProcesses(), "");
     EXPECT_EQ(readFileText("/proc/self/mounts"), mounts_);
-    EXPECT_FALSE(contains(readFileText("/proc/net/tcp") + readFileText("/proc/net/tcp6"), " 0A "))
-        << "something listens";
+    EXPECT_FALSE(somethingListens());
     clearFolders();
     fs::remove(logFile);
 }
 
 void HostService::startHost() {
+    const std::string built = VELT_BUILT_FOLDER;
     host = RunningProgram::start(
-        {VELT_BUILT_FOLDER "/veltd", "--state-root", worldRoot, "--module",
-         VELT_BUILT_FOLDER "/VELT.Core.FileServ.FTP.so", "--listen", "127.0.0.1:0", "--print-ready"},
-        {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LANG=C.UTF-8", "VELT_LIBEXEC_DIR=" VELT_BUILT_FOLDER},
-        logFile);
+        {built + "/veltd", "--state-root", worldRoot, "--module", built + "/VELT.Core.FileServ.FTP.so",
+         "--listen", "127.0.0.1:0", "--print-ready"},
+        {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LANG=C.UTF-8", "VELT_LIBEXEC_DIR=" + built}, logFile);
     const Json::Value ready = jsonOf(host.readUntil("\n"));
     ASSERT_TRUE(ready.isObject()) << hostLog();
     const std::string address = ready["listen"][0].asString();
@@ -95,7 +94,7 @@ ProcessResult HostService::veltctl(Words words, const std::string& input) {
     return runProcess(words, input, requestLimit);
 }
 
-std::string HostService::done(Words words, const std::string& input) {
+std::string HostService::done(const Words& words, const std::string& input) {
     const ProcessResult result = veltctl(words, input);
     EXPECT_EQ(result.exitCode, 0) << testing::PrintToString(words) << "\n" << result.errors << hostLog();
     return result.output;

@@ -51,7 +51,7 @@ protected:
     /// veltctl over the Unix socket, as root.
     static ProcessResult veltctl(Words words, const std::string& input = {});
     /// The same, which has to succeed.
-    static std::string done(Words words, const std::string& input = {});
+    static std::string done(const Words& words, const std::string& input = {});
     /// veltctl over TCP with a token.
     ProcessResult veltctlWith(const std::string& token, Words words) const;
     /// veltctl over the Unix socket as a user of the world.

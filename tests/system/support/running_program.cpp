@@ -17,6 +17,7 @@ namespace {
 
 std::vector<char*> pointersTo(const std::vector<std::string>& texts) {
     std::vector<char*> pointers;
+    pointers.reserve(texts.size() + 1);
     for (const std::string& text : texts) {
         pointers.push_back(const_cast<char*>(text.c_str()));
     }
@@ -76,7 +77,7 @@ std::string RunningProgram::readUntil(const std::string& text) {
         const auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
             deadline - std::chrono::steady_clock::now());
         pollfd waiting{output_.get(), POLLIN, 0};
-        std::array<char, 4096> buffer;
+        std::array<char, 4096> buffer{};
         const bool ready = left.count() > 0 && poll(&waiting, 1, static_cast<int>(left.count())) == 1;
         const ssize_t count = ready ? read(output_.get(), buffer.data(), buffer.size()) : 0;
         if (count <= 0) {
