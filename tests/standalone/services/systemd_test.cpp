@@ -102,11 +102,6 @@ OOMPolicy=continue
     EXPECT_EQ(unitName("ftpd"), "velt-ftpd.service");
 }
 
-TEST(SystemdUnit, ReadsNoPortFromALineThatHoldsNone) {
-    EXPECT_EQ(readUnit("Port=21\nPort=\nPort=x\nPort=99999999999\nPort=990\n").listenPorts,
-              (std::vector<int>{21, 990}));
-}
-
 TEST(SystemdUnit, QuotesWhatHasAMeaningOfItsOwn) {
     EXPECT_EQ(quoteUnitWord("a b"), "\"a b\"");
     EXPECT_EQ(quoteUnitWord(R"(a"b\c)"), R"("a\"b\\c")");

@@ -77,7 +77,8 @@ void thinOut() {
     for (const char* unit :
          {"systemd-sysctl", "systemd-binfmt", "systemd-modules-load", "systemd-random-seed", "systemd-repart",
           "systemd-update-utmp", "systemd-update-utmp-runlevel", "kmod-static-nodes", "systemd-firstboot",
-          "systemd-timesyncd", "systemd-networkd", "systemd-resolved", "systemd-udevd", "getty-static"}) {
+          "systemd-tmpfiles-setup-dev", "systemd-timesyncd", "systemd-networkd", "systemd-resolved",
+          "systemd-udevd", "getty-static"}) {
         fs::create_symlink("/dev/null", units / (std::string(unit) + ".service"));
     }
     write(root / "etc/fstab", "");
