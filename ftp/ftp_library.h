@@ -77,7 +77,9 @@ static_assert(offsetof(VELT_FTP_PORT_RANGE, last) == 4, "last");
 int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out);
 
 /// Stores the record, which becomes the service configuration; running daemons take it up at their next
-/// start. Negative on failure, which leaves the stored record as it was.
+/// start. Negative on failure, which leaves the stored record as it was. A platform whose settings are
+/// changed by several callers may store those fields (of service_flags, those bits) alone in which the record
+/// differs from what the calling thread last read or stored, so that what another caller changed since stays.
 int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf);
 
 /// The idle time-out. The platform settles its unit; callers pass it on as it is, a negative one too.
