@@ -82,10 +82,10 @@ NextStart nextStart(Daemon daemon, const ServiceState& now) {
 }
 
 /// After a start or a stop with this result: the rules open the ports of what is enabled, which may have
-/// changed although no port did. A daemon that did what was asked of it has not failed because of them.
+/// changed although no port did.
 int followedByFirewall(int result) {
-    if (result >= 0 && VELTFwRuleHup() < 0) {
-        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    if (result >= 0) {
+        followWithFirewall();
     }
     return result;
 }
@@ -110,6 +110,13 @@ int startPlanned(Daemon daemon) {
 }
 
 } // namespace
+
+void followWithFirewall() {
+    const LastErrorKept kept;
+    if (VELTFwRuleHup() < 0) {
+        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    }
+}
 
 std::string daemonName(Daemon daemon) {
     return daemon == Daemon::ftp ? "ftpd" : "sftp";

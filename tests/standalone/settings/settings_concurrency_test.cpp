@@ -90,6 +90,7 @@ TEST_F(SettingsConcurrency, ProcessesThatChangeDifferentFieldsOfTheRecordLoseNon
     const std::vector fields{&_tag_VELT_FTP_CONF_::max_conn_per_ip, &_tag_VELT_FTP_CONF_::maxuploadrate,
                              &_tag_VELT_FTP_CONF_::maxdownloadrate};
     std::vector<std::function<bool()>> works;
+    works.reserve(fields.size());
     for (const auto field : fields)
         works.push_back([field] { return changeOften(field); });
     runAtOnce(works);
