@@ -90,6 +90,16 @@ int followedByFirewall(int result) {
     return result;
 }
 
+/// Nothing, with the last error set, when the settings cannot be read.
+std::optional<bool> isEnabled(Daemon daemon) {
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        return settings ? std::optional(enablesFtp(settings->record)) : std::nullopt;
+    }
+    const auto settings = loadSftpSettings();
+    return settings ? std::optional(settings->enabled) : std::nullopt;
+}
+
 int startPlanned(Daemon daemon) {
     const auto backend = makeServiceBackend(daemonName(daemon));
     if (daemon == Daemon::ftp) {
@@ -165,6 +175,30 @@ int stopDaemonForRestart(Daemon daemon) {
 int pauseDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
     return lock ? makeServiceBackend(daemonName(daemon))->pause() : -1;
+}
+
+bool lostItsSupervisor(const ServiceState& state) {
+    const bool wasAtWork = state.state == RunState::running || state.state == RunState::failed;
+    return wasAtWork && state.supervisor && !isAlive(state.supervisor);
+}
+
+int restoreDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    // Somebody may have taken it in hand while the lock was waited for.
+    const ServiceState now = daemonState(daemon);
+    if (isServing(now) && !lostItsSupervisor(now)) {
+        return 0;
+    }
+    const auto enabled = isEnabled(daemon);
+    if (!enabled) {
+        return -1;
+    }
+    const std::string name = daemonName(daemon);
+    return followedByFirewall(
+        noteOutcome(name, *enabled ? startPlanned(daemon) : makeServiceBackend(name)->stop()));
 }
 
 ServiceState daemonState(Daemon daemon) {

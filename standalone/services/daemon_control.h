@@ -41,6 +41,14 @@ int pauseDaemon(Daemon daemon);
 /// because of its rules: a failure goes to syslog, and the last error stays as it was.
 void followWithFirewall();
 
+/// Whether the daemon's supervisor ended without having been asked to. One that was stopped, or could not
+/// start its daemon, says so before its end; and a paused service waits for its resume, with or without one.
+bool lostItsSupervisor(const ServiceState& state);
+
+/// Brings a daemon that does not serve under a supervisor back to what the stored settings say: ends what a
+/// lost supervisor left, and starts it when it is enabled.
+int restoreDaemon(Daemon daemon);
+
 ServiceState daemonState(Daemon daemon);
 
 } // namespace velt
