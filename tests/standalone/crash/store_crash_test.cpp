@@ -33,6 +33,10 @@ struct Store {
     std::string (*read)(); ///< what is stored; "unreadable ..." when that cannot be told
 };
 
+void PrintTo(const Store& store, std::ostream* out) {
+    *out << store.name;
+}
+
 std::string unreadable() {
     return "unreadable: " + lastErrorSentence();
 }
