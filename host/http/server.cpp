@@ -90,8 +90,7 @@ struct HttpServer::Core {
     }
 
     void welcome(Door& door) {
-        PlainStream socket = std::move(door.peer);
-        door.peer = PlainStream(context);
+        PlainStream socket = std::move(door.peer); // leaves a closed socket for the next one
         const bool isTls = tlsContext != nullptr && !door.listener.isUnixSocket();
         Peer peer = peerOf(socket.native_handle(), isTls);
         if (!peer.isUnixSocket) {

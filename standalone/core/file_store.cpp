@@ -91,7 +91,9 @@ int replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
     const fs::path folder = path.has_parent_path() ? path.parent_path() : fs::path(".");
     if (makeFolder(folder) < 0)
         return -1;
-    const fs::path temporary = folder / ("." + path.filename().string() + ".new");
+    fs::path temporary = folder / ".";
+    temporary += path.filename();
+    temporary += ".new";
     const UniqueFd fd = openTemporary(temporary);
     if (!fd)
         return failHere("make", temporary, errno);

@@ -96,6 +96,7 @@ public:
             ::posix_spawn_file_actions_adddup2(&actions_, standard[static_cast<std::size_t>(i)], i);
         ::posix_spawn_file_actions_addclosefrom_np(&actions_, STDERR_FILENO + 1);
         std::vector<char*> argv;
+        argv.reserve(arguments.size() + 1);
         for (const std::string& argument : arguments)
             argv.push_back(const_cast<char*>(argument.c_str()));
         argv.push_back(nullptr);
@@ -113,7 +114,7 @@ private:
 // Takes what stands in the pipe now. Past the limit it is read all the same, so that the writer does not
 // stall.
 void drain(UniqueFd& pipe, std::string& text) {
-    std::array<char, 65536> block;
+    std::array<char, 65536> block{};
     for (;;) {
         const ssize_t got = ::read(pipe.get(), block.data(), block.size());
         if (got > 0) {

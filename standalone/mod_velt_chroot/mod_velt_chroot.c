@@ -69,7 +69,7 @@ static int get_account(pool* p, const char* login, struct account* account) {
 static int find_rule(pool* p, const char* file, const struct account* account, const char** path) {
     struct velt_lines lines;
     struct velt_rule rule;
-    int status;
+    int status = 0;
 
     *path = NULL;
     if (velt_lines_open(&lines, file, VELT_RULES_HEADER) < 0) {

@@ -36,7 +36,7 @@ int velt_lines_open(struct velt_lines* lines, const char* path, const char* head
 
 int velt_lines_next(struct velt_lines* lines) {
     size_t length = 0;
-    int c;
+    int c = EOF;
 
     while ((c = getc(lines->file)) != EOF && c != '\n') {
         if (c == '\0' || length + 1 >= sizeof(lines->text)) {
@@ -75,7 +75,7 @@ static int is_plain_path(const char* path) {
 }
 
 int velt_rule_parse(const char* line, struct velt_rule* rule) {
-    char* end;
+    char* end = NULL;
 
     if ((line[0] != 'u' && line[0] != 'g') || line[1] != ':' || line[2] < '0' || line[2] > '9') {
         return -1;

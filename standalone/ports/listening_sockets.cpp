@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <charconv>
 #include <filesystem>
 #include <fstream>
@@ -32,11 +33,11 @@ void addSockets(const std::string& table, std::vector<ListeningSocket>& sockets)
             continue;
         }
         std::string skipped;
-        for (int field = 0; field < 5; ++field) { // queues, timer, retransmissions, uid, timeout
+        ListeningSocket socket;
+        for (int field = 0; field < 3; ++field) { // queues, timer, retransmissions
             fields >> skipped;
         }
-        ListeningSocket socket;
-        fields >> socket.inode;
+        fields >> socket.user >> skipped >> socket.inode; // a timeout between them
         const auto colon = local.rfind(':');
         if (!fields || colon == std::string::npos) {
             continue;
@@ -74,6 +75,27 @@ std::set<unsigned long> socketsHeldBy(pid_t pid) {
         }
     }
     return inodes;
+}
+
+/// Whether the process hides its sockets from this one: those that have changed their rights show them to
+/// root alone, an FTP daemon among them that runs as the same user.
+bool hidesItsSockets(pid_t pid) {
+    const std::string folder = "/proc/" + std::to_string(pid) + "/fd";
+    return ::access(folder.c_str(), R_OK) != 0 && errno == EACCES;
+}
+
+std::optional<uid_t> userOf(pid_t pid) {
+    std::ifstream file("/proc/" + std::to_string(pid) + "/status");
+    std::string key;
+    while (file >> key) {
+        uid_t real = 0;
+        uid_t effective = 0;
+        if (key == "Uid:" && file >> real >> effective) {
+            return effective;
+        }
+        std::getline(file, key);
+    }
+    return std::nullopt;
 }
 
 std::string programOf(pid_t pid) {
@@ -115,6 +137,11 @@ bool listensOn(pid_t pid, int port) {
     std::erase_if(sockets, [port](const ListeningSocket& socket) { return socket.port != port; });
     if (sockets.empty()) {
         return false;
+    }
+    if (hidesItsSockets(pid)) {
+        const auto user = userOf(pid);
+        return std::any_of(sockets.begin(), sockets.end(),
+                           [user](const ListeningSocket& socket) { return user == socket.user; });
     }
     const std::set<unsigned long> held = socketsHeldBy(pid);
     return std::any_of(sockets.begin(), sockets.end(),

@@ -13,13 +13,15 @@ namespace velt {
 struct ListeningSocket {
     int port = 0;
     unsigned long inode = 0;
+    uid_t user = 0; ///< who opened it
 };
 
 /// The listening TCP sockets, IPv4 and IPv6, of the network namespace in which the process `pid` lives; 0 is
 /// the caller.
 std::vector<ListeningSocket> listeningSockets(pid_t pid = 0);
 
-/// Whether the process itself holds a listening socket on the port.
+/// Whether the process itself holds a listening socket on the port. Of a process that does not let this one
+/// see its sockets: whether its user has one there.
 bool listensOn(pid_t pid, int port);
 
 struct SocketOwner {

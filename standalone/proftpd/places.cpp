@@ -6,6 +6,7 @@
 #include "standalone/core/unique_fd.h"
 #include "standalone/installed_files.h"
 #include "standalone/proftpd/share_lists.h"
+#include "standalone/settings/network_settings.h"
 #include "standalone/shares/share_privilege.h"
 #include "standalone/tls/certificate.h"
 
@@ -137,6 +138,11 @@ std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
         return std::nullopt;
     }
     const bool tls = (settings.record.service_flags & VELT_FTP_SERVICE_TLS) != 0;
+    const auto network = loadNetworkSettings();
+    if (!network) {
+        return std::nullopt;
+    }
+    places.loopbackOnly = network->loopbackOnly;
     if (surveyRights(places) < 0 || (settings.record.anonymous != 0 && checkAnonymousAccount() < 0) ||
         surveyShares(settings, found) < 0 || (tls && surveyCertificate(found) < 0)) {
         return std::nullopt;

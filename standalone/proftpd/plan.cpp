@@ -10,8 +10,6 @@
 #include "standalone/settings/candidate.h"
 #include "standalone/tls/digest.h"
 
-#include <cstdlib>
-
 namespace velt {
 namespace {
 
@@ -96,7 +94,7 @@ std::optional<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings
     // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
     plan.arguments.insert(plan.arguments.end(), {program, "-n", "-c", configuration.string()});
     plan.executable = program;
-    plan.listenPorts = {std::atoi(settings.record.portnum)};
+    plan.listenPorts = {controlPort(settings.record)};
     return plan;
 }
 

@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <array>
-#include <cstdlib>
 #include <string_view>
 #include <type_traits>
 #include <utility>
@@ -82,11 +81,12 @@ std::optional<std::string> ipv4(const std::string& text) {
 
 void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
     const auto& record = settings.record;
-    text.line("UseIPv6", places.ipv6 ? "on" : "off");
+    const bool ipv6 = places.ipv6 && !places.loopbackOnly;
+    text.line("UseIPv6", ipv6 ? "on" : "off");
     // Without an address of its own the daemon resolves the host's name, and does not start where that fails.
-    text.line("DefaultAddress", places.ipv6 ? "::" : "0.0.0.0");
+    text.line("DefaultAddress", ipv6 ? "::" : places.loopbackOnly ? "127.0.0.1" : "0.0.0.0");
     text.line("SocketBindTight on");
-    text.line("Port", std::atoi(record.portnum));
+    text.line("Port", controlPort(record));
     // The firewall opens this range and no other, so it is never left to the kernel.
     const bool custom = record.passive_port_min != 0 && record.passive_port_max != 0;
     text.line("PassivePorts", custom ? record.passive_port_min : defaultPassiveRange.first,

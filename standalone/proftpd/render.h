@@ -31,6 +31,7 @@ struct ProftpdPlaces {
     std::string user = "proftpd";
     std::string group = "nogroup";
     bool ipv6 = true;
+    bool loopbackOnly = false; ///< clients of this machine only, over IPv4
     bool anonymousMayWrite = false;
     std::optional<AccountFiles> accountFiles; ///< absent: the server's users, through PAM
 };

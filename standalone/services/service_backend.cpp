@@ -3,7 +3,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/services/supervise_backend.h"
-#include "standalone/services/systemd_backend.h"
+#include "standalone/services/systemd_launcher.h"
 
 #include <system_error>
 
@@ -14,13 +14,13 @@ std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon) {
     std::error_code error;
     const bool systemdRuns = std::filesystem::is_directory("/run/systemd/system", error);
     if (systemdRuns && statePath("/") == "/") {
-        return std::make_unique<SystemdBackend>(daemon);
+        return std::make_unique<SuperviseBackend>(daemon, std::make_unique<SystemdLauncher>(daemon));
     }
     return std::make_unique<SuperviseBackend>(daemon);
 }
 
 std::filesystem::path runDirectory() {
-    const std::filesystem::path directory = statePath("/run/velt");
+    std::filesystem::path directory = statePath("/run/velt");
     std::error_code error;
     std::filesystem::create_directories(directory, error);
     if (error) {

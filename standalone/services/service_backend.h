@@ -1,4 +1,5 @@
-// What runs a daemon: systemd where it is in charge of the machine, else our own supervisor.
+// What runs a daemon: a supervisor of its own, which systemd looks after where it is in charge of the
+// machine.
 #ifndef VELT_STANDALONE_SERVICES_SERVICE_BACKEND_H
 #define VELT_STANDALONE_SERVICES_SERVICE_BACKEND_H
 

@@ -3,12 +3,18 @@
 #define VELT_STANDALONE_SERVICES_SUPERVISE_BACKEND_H
 
 #include "standalone/services/service_backend.h"
+#include "standalone/services/supervisor_launcher.h"
+
+#include <memory>
 
 namespace velt {
 
+/// Speaks to the daemon's supervisor, and has the launcher start one where none runs.
 class SuperviseBackend : public ServiceBackend {
 public:
+    /// With supervisors that are nobody's but their own.
     explicit SuperviseBackend(std::string daemon);
+    SuperviseBackend(std::string daemon, std::unique_ptr<SupervisorLauncher> launcher);
 
     int start(const DaemonPlan& plan) override;
     int pause() override;
@@ -16,10 +22,11 @@ public:
     ServiceState state() const override;
 
 private:
-    int launchSupervisor(const std::filesystem::path& directory, const DaemonPlan& plan) const;
-    int failToStart(const std::string& reason) const;
+    void keep(const std::filesystem::path& directory, const DaemonPlan& plan);
+    int outcome(const std::string& reason) const;
 
     std::string daemon_;
+    std::unique_ptr<SupervisorLauncher> launcher_;
 };
 
 } // namespace velt

@@ -1,17 +1,12 @@
 #include "standalone/services/systemd_unit.h"
 
+#include "standalone/installed_files.h"
+
 #include <array>
 #include <cstdio>
-#include <cstdlib>
 #include <sstream>
 
 namespace velt {
-namespace {
-
-constexpr std::string_view hashKey = "Configuration=";
-constexpr std::string_view portKey = "Port=";
-
-} // namespace
 
 std::string unitName(const std::string& daemon) {
     return "velt-" + daemon + ".service";
@@ -37,44 +32,40 @@ std::string quoteUnitWord(std::string_view argument) {
     return word + '"';
 }
 
-std::string renderUnit(const std::string& daemon, const DaemonPlan& plan) {
+// Not the daemon itself: SFTP sessions register with the login manager, which moves them out of the unit's
+// control group, so once their listener is gone only their ancestry shows whose they are.
+std::string renderUnit(const std::string& daemon, const std::filesystem::path& directory) {
     std::ostringstream text;
     text << "[Unit]\n"
          << "Description=VELT " << (daemon == "sftp" ? "SFTP" : "FTP") << " server\n"
          << "After=network.target\n"
+         // An administrator who changes settings often is no loop of crashes.
          << "StartLimitIntervalSec=0\n"
          << "\n[Service]\n"
-         << "Type=exec\n"
-         << "ExecStart=";
-    const char* separator = "";
-    for (const std::string& argument : plan.arguments) {
-        text << separator << quoteUnitWord(argument);
-        separator = " ";
-    }
-    text << "\nRestart=always\n"
-         << "RestartSec=500ms\n"
-         << "TimeoutStopSec=2s\n"
-         // The sessions of SFTP outlive a pause; those of FTP end with their server.
-         << "KillMode=" << (daemon == "sftp" ? "process" : "control-group") << "\n"
-         << "\n[X-Velt]\n"
-         << hashKey << plan.configurationHash << '\n';
-    for (const int port : plan.listenPorts) {
-        text << portKey << port << '\n';
-    }
+         << "Type=notify\n"
+         << "ExecStart=" << quoteUnitWord(installedFile("velt-supervise").string()) << ' '
+         << quoteUnitWord(directory.string()) << ' ' << quoteUnitWord(daemon)
+         << '\n'
+         // A supervisor that was killed comes back, one that says that its daemon does not start is not asked
+         // again. It starts the daemon anew itself.
+         << "Restart=on-abnormal\n"
+         << "RestartSec=100ms\n"
+         // The supervisor ends what it started, and its successor what is left of a killed one.
+         << "KillMode=process\n"
+         << "TimeoutStartSec=10s\n"
+         << "TimeoutStopSec=5s\n"
+         // One session too large for the machine's memory is no reason to end the others.
+         << "OOMPolicy=continue\n";
     return text.str();
 }
 
-DaemonPlan readUnit(std::string_view text) {
-    DaemonPlan plan;
-    std::istringstream lines{std::string(text)};
-    for (std::string line; std::getline(lines, line);) {
-        if (line.starts_with(hashKey)) {
-            plan.configurationHash = line.substr(hashKey.size());
-        } else if (line.starts_with(portKey)) {
-            plan.listenPorts.push_back(std::atoi(line.c_str() + portKey.size()));
-        }
+std::vector<UnitFile> unitFiles(const std::string& daemon, const std::filesystem::path& directory) {
+    std::vector<UnitFile> files{{unitName(daemon), renderUnit(daemon, directory)}};
+    if (daemon == "sftp") {
+        // /run/sshd is that unit's, and gone when it is stopped; but each of our connections needs it, too.
+        files.push_back({"ssh.service.d/velt-sftp.conf", "[Service]\nRuntimeDirectoryPreserve=yes\n"});
     }
-    return plan;
+    return files;
 }
 
 } // namespace velt

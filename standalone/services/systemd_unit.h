@@ -2,22 +2,26 @@
 #ifndef VELT_STANDALONE_SERVICES_SYSTEMD_UNIT_H
 #define VELT_STANDALONE_SERVICES_SYSTEMD_UNIT_H
 
-#include "standalone/daemon_plan.h"
-
+#include <filesystem>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace velt {
 
 /// "velt-ftpd.service" for the daemon "ftpd".
 std::string unitName(const std::string& daemon);
 
-/// The unit's text. It also carries the plan's configuration hash and ports, in a section that systemd leaves
-/// alone.
-std::string renderUnit(const std::string& daemon, const DaemonPlan& plan);
+/// The text of the unit that runs the daemon's supervisor, which finds what to start in the directory.
+std::string renderUnit(const std::string& daemon, const std::filesystem::path& directory);
 
-/// What a unit's text says about the plan that it was made from; the arguments stay empty.
-DaemonPlan readUnit(std::string_view text);
+struct UnitFile {
+    std::filesystem::path name; ///< below the folder of units
+    std::string text;
+};
+
+/// All that systemd is given for the daemon.
+std::vector<UnitFile> unitFiles(const std::string& daemon, const std::filesystem::path& directory);
 
 /// One argument as a word of ExecStart=, safe against every meaning that systemd gives to characters.
 std::string quoteUnitWord(std::string_view argument);

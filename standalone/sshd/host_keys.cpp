@@ -44,6 +44,7 @@ int makeKey(const std::string& kind, const std::filesystem::path& place) {
 
 std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {
     std::vector<std::filesystem::path> keys;
+    keys.reserve(kinds.size());
     for (const std::string_view kind : kinds) {
         keys.push_back(folder / ("host_" + std::string(kind) + "_key"));
     }

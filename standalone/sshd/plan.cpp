@@ -5,6 +5,7 @@
 #include "standalone/daemon_test.h"
 #include "standalone/proftpd/render.h"
 #include "standalone/settings/candidate.h"
+#include "standalone/settings/network_settings.h"
 #include "standalone/sshd/host_keys.h"
 #include "standalone/sshd/render.h"
 #include "standalone/tls/digest.h"
@@ -41,7 +42,11 @@ std::optional<std::string> rendering(const SftpSettings& settings) {
                                        " has a name that the SFTP daemon's configuration cannot hold.");
         return std::nullopt;
     }
-    return renderSshd(settings, {*keys, geteuid() == 0});
+    const auto network = loadNetworkSettings();
+    if (!network) {
+        return std::nullopt;
+    }
+    return renderSshd(settings, {*keys, geteuid() == 0, network->loopbackOnly});
 }
 
 int testRendering(const std::string& text) {

@@ -6,6 +6,7 @@ std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places) {
     std::string text = "# Made from the stored settings; changes here are lost.\n"
                        "Port " +
                        std::to_string(settings.port) + "\n";
+    text += places.loopbackOnly ? "ListenAddress 127.0.0.1\n" : "";
     for (const auto& key : places.hostKeys) {
         text += "HostKey \"" + key.string() + "\"\n";
     }

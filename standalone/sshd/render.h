@@ -12,7 +12,8 @@ namespace velt {
 
 struct SshdPlaces {
     std::vector<std::filesystem::path> hostKeys; ///< absolute, without quotes, control characters and '%'
-    bool privileged = true; ///< else the daemon serves its own user alone, with keys and without passwords
+    bool privileged = true;    ///< else the daemon serves its own user alone, with keys and without passwords
+    bool loopbackOnly = false; ///< clients of this machine only, over IPv4
 };
 
 /// The whole configuration: file transfer and nothing else. The settings have passed checkSftpSettings. A

@@ -19,7 +19,7 @@
 namespace velt {
 namespace {
 
-constexpr std::size_t largestMessage = 64 * 1024;
+constexpr std::size_t largestMessage = 64UL * 1024;
 constexpr std::array<std::pair<Command, std::string_view>, 3> commandNames{{
     {Command::start, "start"},
     {Command::pause, "pause"},

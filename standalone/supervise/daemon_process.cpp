@@ -21,7 +21,7 @@
 namespace velt {
 namespace {
 
-constexpr std::size_t keptLines = 5;
+constexpr std::size_t keptLines = 20; // the reason comes first, and advice after it
 constexpr std::size_t longestLine = 400;
 
 class SpawnSetup {

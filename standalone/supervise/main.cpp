@@ -1,11 +1,17 @@
 // velt-supervise: keeps one daemon running.
 //
 //     velt-supervise DIRECTORY SERVICE CONFIGURATION PORTS PROGRAM [ARGUMENT...]
+//     velt-supervise DIRECTORY SERVICE
 //
 // DIRECTORY holds the state file, the lock and the control socket; PORTS are separated by commas;
 // CONFIGURATION identifies what the daemon is started for. The process that was started ends at once; its
 // child goes on and writes "ready", or "failed" and the reason, to descriptor 3.
+//
+// In the second form it is a service manager's: it stays in the foreground, finds what to start in
+// DIRECTORY's order file, and says how that went as sd_notify(3) describes it.
 
+#include "standalone/supervise/control_channel.h"
+#include "standalone/supervise/service_manager.h"
 #include "standalone/supervise/supervisor.h"
 
 #include <fcntl.h>
@@ -20,6 +26,8 @@
 #include <cstdio>
 #include <cstring>
 #include <exception>
+#include <fstream>
+#include <iterator>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -47,7 +55,17 @@ std::optional<std::vector<int>> parsePorts(std::string_view text) {
     return ports;
 }
 
-void report(const std::string& reason) {
+std::optional<velt::DaemonOrder> readOrder(const std::string& directory, const std::string& service) {
+    std::ifstream file(velt::orderFile(directory, service), std::ios::binary);
+    const auto request = velt::decodeRequest({std::istreambuf_iterator<char>(file), {}});
+    return request && request->command == velt::Command::start ? std::optional(request->order) : std::nullopt;
+}
+
+void reportToManager(const std::string& reason) {
+    velt::tellServiceManager(reason.empty() ? "READY=1" : "STATUS=" + reason);
+}
+
+void reportToCaller(const std::string& reason) {
     const std::string text = reason.empty() ? "ready" : "failed " + reason;
     if (::write(reportDescriptor, text.data(), text.size()) < 0) {
         ::syslog(LOG_WARNING, "nobody heard: %s", text.c_str());
@@ -76,7 +94,8 @@ void detach() {
     ::signal(SIGPIPE, SIG_IGN);
 }
 
-int supervise(const std::string& directory, const std::string& service, const velt::DaemonOrder& order) {
+int supervise(const std::string& directory, const std::string& service, const velt::DaemonOrder& order,
+              void (*report)(const std::string&)) {
     velt::Supervisor supervisor(directory, service);
     const std::string reason = supervisor.begin(order);
     report(reason);
@@ -87,25 +106,46 @@ int supervise(const std::string& directory, const std::string& service, const ve
     return 0;
 }
 
+int superviseForManager(const std::string& directory, const std::string& service) {
+    const auto order = readOrder(directory, service);
+    if (!order) {
+        reportToManager("nothing in " + directory + " says what to start");
+        return 1;
+    }
+    ::umask(S_IWGRP | S_IWOTH);
+    ::signal(SIGPIPE, SIG_IGN);
+    return supervise(directory, service, *order, reportToManager);
+}
+
+int superviseDetached(int argc, char** argv) {
+    const auto ports = parsePorts(argv[4]);
+    if (!ports) {
+        std::fprintf(stderr, "velt-supervise: \"%s\" are no ports\n", argv[4]);
+        return 2;
+    }
+    const velt::DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
+    detach();
+    return supervise(argv[1], argv[2], order, reportToCaller);
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
+    constexpr int managedArguments = 3;
     constexpr int fewestArguments = 6;
-    const auto ports = argc >= fewestArguments ? parsePorts(argv[4]) : std::nullopt;
-    if (!ports) {
-        std::fputs("usage: velt-supervise DIRECTORY SERVICE CONFIGURATION PORTS PROGRAM [ARGUMENT...]\n",
+    if (argc != managedArguments && argc < fewestArguments) {
+        std::fputs("usage: velt-supervise DIRECTORY SERVICE [CONFIGURATION PORTS PROGRAM [ARGUMENT...]]\n",
                    stderr);
         return 2;
     }
-    velt::DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
     // What the daemons write goes there as well, the reasons of refused logins among it, so it is under their
     // names.
     const std::string ident =
         std::string_view(argv[2]) == "sftp" ? "velt-sftpd" : std::string("velt-") + argv[2];
     ::openlog(ident.c_str(), LOG_PID, LOG_DAEMON);
-    detach();
     try {
-        return supervise(argv[1], argv[2], order);
+        return argc == managedArguments ? superviseForManager(argv[1], argv[2])
+                                        : superviseDetached(argc, argv);
     } catch (const std::exception& error) {
         ::syslog(LOG_CRIT, "%s", error.what());
         return 1;

@@ -110,6 +110,10 @@ std::filesystem::path lockFile(const std::filesystem::path& directory, const std
     return directory / (service + ".lock");
 }
 
+std::filesystem::path orderFile(const std::filesystem::path& directory, const std::string& service) {
+    return directory / (service + ".order");
+}
+
 std::optional<ServiceState> readServiceState(const std::filesystem::path& file) {
     std::ifstream input(file);
     std::string line;

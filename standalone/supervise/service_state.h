@@ -31,6 +31,7 @@ struct ServiceState {
 /// The files of a service in the folder that holds all of them.
 std::filesystem::path stateFile(const std::filesystem::path& directory, const std::string& service);
 std::filesystem::path lockFile(const std::filesystem::path& directory, const std::string& service);
+std::filesystem::path orderFile(const std::filesystem::path& directory, const std::string& service);
 
 /// Nothing when there is no such file, not one of this form, or one from before the machine started: its
 /// processes are gone, and others may have their numbers.

@@ -1,5 +1,7 @@
 #include "standalone/supervise/supervisor.h"
 
+#include "standalone/supervise/service_manager.h"
+
 #include <fcntl.h>
 #include <poll.h>
 #include <sys/file.h>
@@ -38,6 +40,21 @@ int openSignals() {
     return ::signalfd(-1, &wanted, SFD_CLOEXEC | SFD_NONBLOCK);
 }
 
+/// For those who look at the unit and find it active: that is the supervisor.
+std::string statusLine(const ServiceState& state) {
+    switch (state.state) {
+    case RunState::running:
+        return "STATUS=the daemon serves";
+    case RunState::paused:
+        return "STATUS=paused, only sessions of before go on";
+    case RunState::failed:
+        return "STATUS=the daemon does not serve: " + state.reason;
+    case RunState::stopped:
+        break;
+    }
+    return "STATUS=";
+}
+
 } // namespace
 
 Supervisor::Supervisor(std::filesystem::path directory, std::string service)
@@ -68,7 +85,7 @@ std::string Supervisor::begin(const DaemonOrder& order) {
         return "the supervisor cannot make its control socket in " + directory_.string();
     }
     order_ = order;
-    const std::string reason = startDaemon(deadline);
+    std::string reason = startDaemon(deadline);
     if (!reason.empty()) {
         control_.reset();
         endProcesses([] { return descendantsOf(::getpid()); }, patience);
@@ -247,6 +264,7 @@ void Supervisor::publish(RunState state, std::string reason) {
     record.sessions = descendantsOf(::getpid());
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);
+    tellServiceManager(statusLine(record));
     if (!writeServiceState(stateFile(directory_, service_), record)) {
         ::syslog(LOG_ERR, "the state of %s cannot be written: %s", service_.c_str(), std::strerror(errno));
     }

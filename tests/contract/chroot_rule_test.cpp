@@ -21,7 +21,7 @@ void PrintTo(const Rule& rule, std::ostream* out) {
 class ChrootRuleContract : public ContractTest {
 protected:
     static std::string format(bool isUser, int id, const std::string& path) {
-        std::array<char, 512> line;
+        std::array<char, 512> line{};
         line.fill('?');
         EXPECT_GE(VELTFTPChrootRuleFormat(line.data(), int{line.size()}, isUser ? 1 : 0, id, path.c_str()), 0)
             << lastError();

@@ -16,7 +16,7 @@ protected:
     /// The key's value in the system information file, in a buffer of `size` bytes; nothing when there is no
     /// such key.
     static std::optional<std::string> read(const char* key, int size = 64) {
-        std::array<char, 64> buffer;
+        std::array<char, 64> buffer{};
         buffer.fill('?');
         const int result = VLIBCFileGetKeyValue(infoFile, key, buffer.data(), size, 0);
         EXPECT_GE(result, 0) << lastError();

@@ -35,7 +35,7 @@ TEST_F(FtpService, idleSessionsEnd) {
 
 class FtpRates : public FtpService {
 protected:
-    const std::string data_ = std::string(300 * 1024, 'x');
+    const std::string data_ = std::string(300UL * 1024, 'x');
 
     double secondsToReceive(FtpSession& session) {
         const auto begin = Clock::now();

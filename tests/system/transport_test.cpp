@@ -152,6 +152,17 @@ TEST_F(FtpService, bothAddressFamiliesAreServed) {
     EXPECT_EQ(file.output, "alice");
 }
 
+TEST_F(FtpService, staysOnTheLoopbackWhereTheAdministratorSaysSo) {
+    start();
+    EXPECT_EQ(FtpSession(port, "127.0.0.2").greeting().code, 220);
+    std::filesystem::create_directories(worldRoot / "etc/velt");
+    writeFile(worldRoot / "etc/velt/network.conf", "version = 1\nloopback_only = 1\n");
+    start();
+    const auto file = curl({"--user", "alice:alice-secret", "ftp://127.0.0.1:2121/home-of"});
+    EXPECT_EQ(file.output, "alice") << file.errors;
+    EXPECT_FALSE(connectTo("127.0.0.2", port)) << "it listens on other addresses, too";
+}
+
 TEST_F(FtpService, passivePortsLieInTheDefaultRange) {
     start();
     FtpSession session(port);

@@ -185,12 +185,12 @@ TEST_F(FakeHandles, MovesAMap) {
     EXPECT_EQ(VLIBSyseventEmit("velt.service.action", map, 1), 0);
     VLIBCSzHashFree(map);
     EXPECT_TRUE(platform.handleErrors().empty());
+    const std::string pairs = R"({"SERVICE_NAME": "ftpd", "SERVICE_ACTION": "stop"})";
     EXPECT_EQ(platform.journal, (Lines{
                                     "VLIBCSzHashAlloc(1024)",
                                     R"(VLIBCSzHashSetValue(map1, "SERVICE_NAME", "ftpd"))",
                                     R"(VLIBCSzHashSetValue(map1, "SERVICE_ACTION", "stop"))",
-                                    R"(VLIBSyseventEmit("velt.service.action", )"
-                                    R"({"SERVICE_NAME": "ftpd", "SERVICE_ACTION": "stop"}, 1))",
+                                    "VLIBSyseventEmit(\"velt.service.action\", " + pairs + ", 1)",
                                     "VLIBCSzHashFree(map1)",
                                 }));
 }

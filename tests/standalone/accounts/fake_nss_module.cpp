@@ -91,7 +91,7 @@ nss_status ENTRY(FAKE_SOURCE, setpwent)(int) {
     position = 0;
     // A domain that is far away.
     if (const char* delay = std::getenv("FAKE_NSS_DELAY_MS"); delay != nullptr) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(delay)));
+        std::this_thread::sleep_for(std::chrono::milliseconds(std::strtol(delay, nullptr, 10)));
     }
     return NSS_STATUS_SUCCESS;
 }

@@ -17,7 +17,7 @@ using Milliseconds = std::chrono::duration<double, std::milli>;
 // The goals are for what is installed, and hold as they are where that is tested. Without the optimiser, or
 // with a sanitizer's checks, the same work takes several times longer; the factors are wide, and what is left
 // of the goals there only notices work that has become another order of magnitude.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#if defined(SANITIZED)
 constexpr double slowness = 20;
 #elif defined(__OPTIMIZE__)
 constexpr double slowness = 1;

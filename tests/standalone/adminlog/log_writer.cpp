@@ -14,7 +14,8 @@ int main(int argc, char** argv) {
     }
     velt::setStateRoot(argv[1]);
     velt::setRequestActor(argv[2], "127.0.0.1");
-    for (int i = 0; i < std::atoi(argv[3]); ++i) {
+    const long count = std::strtol(argv[3], nullptr, 10);
+    for (long i = 0; i < count; ++i) {
         if (VELTLogSet1(1, 1, 0x11B00024, std::to_string(i).c_str(), "", "", "") < 0) {
             std::fprintf(stderr, "%s\n", velt::lastErrorSentence().c_str());
             return 1;

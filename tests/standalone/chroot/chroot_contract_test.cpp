@@ -10,7 +10,7 @@
 #include <gtest/gtest.h>
 
 #include <array>
-#include <chrono>
+#include <ctime>
 #include <memory>
 
 namespace velt::test {
@@ -234,15 +234,16 @@ TEST_F(ChrootContract, aHundredThousandUsersAreChangedAndListedInOneGo) {
     }
     useUsers(passwd);
     List list(names);
-    const auto begin = std::chrono::steady_clock::now();
+    // The processor's time: other processes on the machine lengthen the clock's.
+    const std::clock_t begin = std::clock();
     ASSERT_EQ(VELTFTPAddChrootUser(list.get()), 0) << lastErrorSentence();
     EXPECT_EQ(chrootUsers().size(), static_cast<std::size_t>(count));
     EXPECT_EQ(otherUsers().size(), 0U);
     ASSERT_EQ(VELTFTPDeleteChrootUser(list.get()), 0) << lastErrorSentence();
     EXPECT_EQ(chrootUsers().size(), 0U);
-    const std::chrono::duration<double> taken = std::chrono::steady_clock::now() - begin;
-    RecordProperty("milliseconds", static_cast<int>(taken.count() * 1000));
-    EXPECT_LT(taken.count(), 10) << "one look-up per user would take minutes";
+    const double taken = static_cast<double>(std::clock() - begin) / CLOCKS_PER_SEC;
+    RecordProperty("milliseconds", static_cast<int>(taken * 1000));
+    EXPECT_LT(taken, 10) << "one look-up per user would take minutes";
 }
 
 } // namespace

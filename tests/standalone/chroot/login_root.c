@@ -33,7 +33,7 @@ char* pstrcat(pool* p, ...) {
     char joined[8192] = "";
     va_list parts;
     va_start(parts, p);
-    for (const char* part; (part = va_arg(parts, const char*)) != NULL;) {
+    for (const char* part = NULL; (part = va_arg(parts, const char*)) != NULL;) {
         (void)strncat(joined, part, sizeof(joined) - strlen(joined) - 1);
     }
     va_end(parts);

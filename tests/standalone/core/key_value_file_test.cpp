@@ -18,7 +18,7 @@ protected:
     std::filesystem::path file_ = root_.path() / "etc" / "info.conf";
 
     std::string read(const char* key, int size = 64) const {
-        std::array<char, 64> buffer;
+        std::array<char, 64> buffer{};
         buffer.fill('?');
         const int result = VLIBCFileGetKeyValue("/etc/info.conf", key, buffer.data(), size, 0);
         if (result <= 0)

@@ -13,6 +13,7 @@
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <csignal>
 #include <string>
 
@@ -30,7 +31,11 @@ bool connects(int port) {
     address.sin_family = AF_INET;
     address.sin_port = htons(static_cast<in_port_t>(port));
     ::inet_pton(AF_INET, "192.0.2.1", &address.sin_addr);
-    ::connect(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address);
+    if (::connect(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address) < 0 &&
+        errno != EINPROGRESS) {
+        ::close(descriptor);
+        return false;
+    }
     pollfd event{descriptor, POLLOUT, 0};
     int error = -1;
     socklen_t size = sizeof error;

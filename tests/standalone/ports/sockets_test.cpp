@@ -8,8 +8,12 @@
 #include "tests/standalone/supervise/daemon_test.h"
 
 #include <netinet/in.h>
+#include <sys/prctl.h>
 #include <sys/socket.h>
+#include <sys/wait.h>
 #include <unistd.h>
+
+#include <array>
 
 namespace velt::test {
 namespace {
@@ -36,6 +40,46 @@ TEST(ListeningSockets, AreFoundForIPv4AndIPv6) {
     ASSERT_EQ(::listen(six, 1), 0);
     EXPECT_TRUE(listensOn(::getpid(), port));
     ::close(six);
+}
+
+// Starts a process that listens and hides it, as daemons do that have changed their rights, and asks as the
+// same user. The exit code says what was seen of it: 1 for its port, 2 for another.
+int seenByItsOwnUser(int port, int otherPort) {
+    constexpr uid_t stranger = 65534;
+    if (::geteuid() == 0 && ::setresuid(stranger, stranger, stranger) != 0) {
+        return -1;
+    }
+    std::array<int, 2> ready{};
+    std::array<int, 2> end{};
+    if (::pipe(ready.data()) != 0 || ::pipe(end.data()) != 0) {
+        return -1;
+    }
+    const pid_t daemon = ::fork();
+    char byte = 0;
+    if (daemon == 0) {
+        ::close(end[1]);
+        const Listener listener(port);
+        const bool hidden = ::prctl(PR_SET_DUMPABLE, 0) == 0;
+        ::_exit(hidden && ::write(ready[1], "x", 1) == 1 && ::read(end[0], &byte, 1) == 0 ? 0 : 1);
+    }
+    const bool isReady = ::read(ready[0], &byte, 1) == 1;
+    const int seen = (listensOn(daemon, port) ? 1 : 0) + (listensOn(daemon, otherPort) ? 2 : 0);
+    ::close(end[1]);
+    ::waitpid(daemon, nullptr, 0);
+    return isReady ? seen : -1;
+}
+
+TEST(ListeningSockets, AreFoundOfAProcessThatHidesThem) {
+    const int port = freePort();
+    const int otherPort = freePort();
+    const pid_t asker = ::fork();
+    if (asker == 0) {
+        ::_exit(seenByItsOwnUser(port, otherPort));
+    }
+    int status = 0;
+    ASSERT_EQ(::waitpid(asker, &status, 0), asker);
+    ASSERT_TRUE(WIFEXITED(status));
+    EXPECT_EQ(WEXITSTATUS(status), 1);
 }
 
 TEST(ListeningSockets, HaveAnOwner) {

@@ -115,6 +115,7 @@ const Case cases[] = {
      }},
     {"anonymous_all_shares", [](auto& s, auto&) { enableAnonymous(s, false); }},
     {"ipv4_only", [](auto&, auto& p) { p.ipv6 = false; }},
+    {"loopback_only", [](auto&, auto& p) { p.loopbackOnly = true; }},
     {"account_files",
      [](auto& s, auto& p) {
          s.record.user_chroot = 0;

@@ -1,54 +1,105 @@
-// The backend for systemd: its units as text, and its conversation with systemctl. The program that answers
-// here is a stand-in; that the real one understands the units shows only where systemd runs.
+// The units for systemd as text, and the conversation with systemctl. The program that answers here is a
+// stand-in, which starts and ends real supervisors.
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
-#include "standalone/services/systemd_backend.h"
+#include "standalone/core/state_root.h"
+#include "standalone/installed_files.h"
+#include "standalone/services/supervise_backend.h"
+#include "standalone/services/systemd_launcher.h"
 #include "standalone/services/systemd_unit.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
 #include <csignal>
 #include <fstream>
+#include <memory>
 #include <sstream>
 
 namespace velt::test {
 namespace {
 
-TEST(SystemdUnit, OfTheFtpDaemon) {
-    DaemonPlan plan;
-    plan.arguments = {"/usr/sbin/proftpd", "-n", "-c", "/run/velt/proftpd.conf"};
-    plan.configurationHash = "0a1b";
-    plan.listenPorts = {21};
-    EXPECT_EQ(renderUnit("ftpd", plan), R"([Unit]
-Description=VELT FTP server
+using std::chrono::milliseconds;
+using std::chrono::seconds;
+
+class SystemdTest : public DaemonTest {
+protected:
+    void SetUp() override {
+        DaemonTest::SetUp();
+        places_.systemctl = (root_ / "systemctl").string();
+        places_.units = root_ / "units";
+        answerWith(systemctlScript());
+        backend_ =
+            std::make_unique<SuperviseBackend>("sftp", std::make_unique<SystemdLauncher>("sftp", places_));
+    }
+
+    void TearDown() override {
+        EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+        DaemonTest::TearDown();
+    }
+
+    /// Writes down what it is asked. A restart runs the supervisor, and ends when the state file tells that
+    /// the daemon serves or does not; a supervisor that fails leaves its reason there.
+    std::string systemctlScript() const {
+        return "cd " + root_.string() + "\necho \"$*\" >> calls\nstate=run/velt/sftp.state\n" +
+               R"(end() { [ -e pid ] && kill $(cat pid) 2>/dev/null; }
+case "$1" in
+restart)
+    end
+    )" + installedFile("velt-supervise").string() +
+               " " + (root_ / "run/velt").string() + R"( sftp >/dev/null 2>&1 &
+    echo $! > pid
+    while kill -0 $! 2>/dev/null; do
+        grep -q "^supervisor $! " $state && grep -q "^state running" $state && exit 0
+        sleep 0.01
+    done
+    exit 1 ;;
+stop) end; exit 0 ;;
+show) sed -n 's/^reason //p' $state ;;
+esac
+)";
+    }
+
+    void answerWith(const std::string& script) const {
+        std::ofstream(places_.systemctl) << "#!/bin/sh\n" << script;
+        std::filesystem::permissions(places_.systemctl, std::filesystem::perms::owner_all);
+    }
+
+    std::string calls() const { return readFile(root_ / "calls").value_or(""); }
+    void forgetCalls() const { std::filesystem::remove(root_ / "calls"); }
+
+    void start(const std::string& hash) {
+        ASSERT_EQ(backend_->start(testPlan(port_, hash)), 0) << lastErrorSentence();
+    }
+
+    void killSupervisor() {
+        const ProcessId supervisor = backend_->state().supervisor;
+        signalProcess(supervisor, SIGKILL);
+        ASSERT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, seconds(1)));
+    }
+
+    int port_ = freePort();
+    SystemdPlaces places_;
+    std::unique_ptr<SuperviseBackend> backend_;
+};
+
+TEST_F(SystemdTest, TheUnitRunsTheSupervisor) {
+    EXPECT_EQ(renderUnit("sftp", "/run/velt"), R"([Unit]
+Description=VELT SFTP server
 After=network.target
 StartLimitIntervalSec=0
 
 [Service]
-Type=exec
-ExecStart="/usr/sbin/proftpd" "-n" "-c" "/run/velt/proftpd.conf"
-Restart=always
-RestartSec=500ms
-TimeoutStopSec=2s
-KillMode=control-group
-
-[X-Velt]
-Configuration=0a1b
-Port=21
+Type=notify
+ExecStart=")" + installedFile("velt-supervise").string() +
+                                                   R"(" "/run/velt" "sftp"
+Restart=on-abnormal
+RestartSec=100ms
+KillMode=process
+TimeoutStartSec=10s
+TimeoutStopSec=5s
+OOMPolicy=continue
 )");
-}
-
-TEST(SystemdUnit, OfTheSftpDaemonLeavesSessionsToAPause) {
-    EXPECT_NE(renderUnit("sftp", {}).find("\nKillMode=process\n"), std::string::npos);
-}
-
-TEST(SystemdUnit, TellsWhatItWasMadeFrom) {
-    DaemonPlan plan;
-    plan.configurationHash = "0a1b";
-    plan.listenPorts = {21, 990};
-    const DaemonPlan read = readUnit(renderUnit("ftpd", plan));
-    EXPECT_EQ(read.configurationHash, "0a1b");
-    EXPECT_EQ(read.listenPorts, plan.listenPorts);
+    EXPECT_EQ(unitName("ftpd"), "velt-ftpd.service");
 }
 
 TEST(SystemdUnit, QuotesWhatHasAMeaningOfItsOwn) {
@@ -60,117 +111,98 @@ TEST(SystemdUnit, QuotesWhatHasAMeaningOfItsOwn) {
     EXPECT_EQ(quoteUnitWord("gr\xc3\xbc\xc3\x9f"), "\"gr\xc3\xbc\xc3\x9f\"");
 }
 
-/// systemctl as a script that writes down what it is asked, and starts and ends the test daemon.
-class SystemdTest : public DaemonTest {
-protected:
-    void SetUp() override {
-        DaemonTest::SetUp();
-        places_.systemctl = (root_ / "systemctl").string();
-        places_.journalctl = (root_ / "journalctl").string();
-        places_.units = root_ / "units";
-        places_.cgroups = root_ / "cgroup";
-        writeScript(places_.systemctl, systemctlScript());
-        writeScript(places_.journalctl, "echo first; echo last words\n");
-    }
-
-    std::string systemctlScript() const {
-        std::string daemon;
-        for (const std::string& argument : testPlan(port_, "").arguments) {
-            daemon += argument + " ";
-        }
-        return "cd " + root_.string() + "\n" + R"(echo "$*" >> calls
-case "$1 $3" in
-"restart ")
-    [ -e pid ] && kill $(cat pid)
-    )" + daemon +
-               R"(>/dev/null 2>&1 &
-    echo $! > pid ;;
-"stop ") kill $(cat pid); rm pid ;;
-*ActiveState) kill -0 $(cat pid) 2>/dev/null && echo active || echo inactive ;;
-*MainPID) cat pid ;;
-*ControlGroup) echo /system.slice/velt-sftp.service ;;
-esac
-)";
-    }
-
-    static void writeScript(const std::filesystem::path& file, const std::string& text) {
-        std::ofstream(file) << "#!/bin/sh\n" << text;
-        std::filesystem::permissions(file, std::filesystem::perms::owner_all);
-    }
-
-    std::string calls() const {
-        std::istringstream all(readFile(root_ / "calls").value_or(""));
-        std::string changing;
-        for (std::string line; std::getline(all, line);) {
-            changing += line.starts_with("show") ? "" : line + "\n";
-        }
-        return changing;
-    }
-
-    int port_ = freePort();
-    SystemdPlaces places_;
-};
-
-TEST_F(SystemdTest, AStartWritesTheUnitAndWaitsUntilTheDaemonListens) {
-    SystemdBackend backend("sftp", places_);
-    const DaemonPlan plan = testPlan(port_, "one");
-    ASSERT_EQ(backend.start(plan), 0) << lastErrorSentence();
+TEST_F(SystemdTest, AStartWritesTheUnitAndReturnsWhenTheDaemonListens) {
+    start("one");
     EXPECT_TRUE(accepts(port_));
-    EXPECT_EQ(readFile(places_.units / "velt-sftp.service"), renderUnit("sftp", plan));
-    EXPECT_TRUE(isServing(backend.state()));
-    EXPECT_EQ(backend.start(plan), 0) << "nothing changed";
+    EXPECT_EQ(readFile(places_.units / "velt-sftp.service"), renderUnit("sftp", statePath("/run/velt")));
+    EXPECT_TRUE(isServing(backend_->state()));
     EXPECT_EQ(calls(), "daemon-reload\nrestart velt-sftp.service\n");
-    EXPECT_EQ(backend.stop(), 0) << lastErrorSentence();
-    EXPECT_EQ(calls(), "daemon-reload\nrestart velt-sftp.service\nstop velt-sftp.service\n");
-    EXPECT_EQ(backend.state().state, RunState::stopped);
+    forgetCalls();
+    start("one");
+    EXPECT_EQ(calls(), "") << "nothing changed";
+    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_EQ(calls(), "stop velt-sftp.service\nreset-failed velt-sftp.service\n");
+    EXPECT_EQ(backend_->state().state, RunState::stopped);
+    forgetCalls();
+    start("two");
+    EXPECT_EQ(calls(), "restart velt-sftp.service\n") << "the unit is as it was";
 }
 
-TEST_F(SystemdTest, AStopEndsTheSessionsInTheControlGroup) {
-    SystemdBackend backend("sftp", places_);
-    ASSERT_EQ(backend.start(testPlan(port_, "one")), 0) << lastErrorSentence();
-    Client client(port_);
+TEST_F(SystemdTest, TheStockServersStopLeavesTheFolderThatEachConnectionNeeds) {
+    start("one");
+    EXPECT_EQ(readFile(places_.units / "ssh.service.d/velt-sftp.conf"),
+              "[Service]\nRuntimeDirectoryPreserve=yes\n");
+    SuperviseBackend ftp("ftpd", std::make_unique<SystemdLauncher>("ftpd", places_));
+    std::filesystem::remove_all(places_.units / "ssh.service.d");
+    EXPECT_LT(ftp.start(testPlan(freePort(), "one", {"--refuse", "no"})), 0);
+    EXPECT_FALSE(std::filesystem::exists(places_.units / "ssh.service.d")) << "FTP does not need it";
+}
+
+TEST_F(SystemdTest, SessionsThatWereMovedOutOfTheUnitOutliveAPauseAndEndWithAStop) {
+    start("one");
+    Client client(port_); // no control group tells whose session this is
     ASSERT_TRUE(client.isServed());
-    const auto sessions = descendantsOf(backend.state().daemon.pid);
-    ASSERT_EQ(sessions.size(), 1U);
-    const auto group = places_.cgroups / "system.slice/velt-sftp.service";
-    std::filesystem::create_directories(group);
-    std::ofstream(group / "cgroup.procs") << sessions[0].pid << '\n';
-    ASSERT_EQ(backend.pause(), 0) << lastErrorSentence();
-    // The real systemctl returns after the daemon's end, the script's kill before it.
-    EXPECT_TRUE(waitUntil([this] { return !accepts(port_); }, std::chrono::seconds(2)));
+    ASSERT_EQ(backend_->pause(), 0) << lastErrorSentence();
+    EXPECT_FALSE(accepts(port_));
     EXPECT_TRUE(client.isServed());
-    std::ofstream(root_ / "pid") << sessions[0].pid << '\n'; // the script's stop wants something to end
-    ASSERT_EQ(backend.stop(), 0) << lastErrorSentence();
+    ASSERT_EQ(backend_->stop(), 0) << lastErrorSentence();
     EXPECT_FALSE(client.isServed());
 }
 
-class FailingSystemdTest : public SystemdTest {
-protected:
-    void SetUp() override {
-        SystemdTest::SetUp();
-        writeScript(places_.systemctl, "case \"$1 $3\" in *ActiveState) echo failed ;; esac\n");
-    }
-};
-
-TEST_F(FailingSystemdTest, AFailedStartGivesTheLastWordsOfTheJournal) {
-    SystemdBackend backend("ftpd", places_);
-    EXPECT_LT(backend.start(testPlan(port_, "one")), 0);
-    EXPECT_EQ(lastErrorSentence(), "The FTP daemon does not start: last words.");
+TEST_F(SystemdTest, AKilledSupervisorComesBackWithTheSettingsThatWereTakenUpLast) {
+    start("one");
+    const int former = port_;
+    port_ = freePort();
+    start("two");
+    killSupervisor();
+    ASSERT_EQ(std::system((places_.systemctl + " restart velt-sftp.service").c_str()), 0);
+    EXPECT_TRUE(accepts(port_));
+    EXPECT_FALSE(accepts(former));
+    EXPECT_EQ(backend_->state().configurationHash, "two");
 }
 
-TEST_F(SystemdTest, ASlowRestartLeavesLessTimeForTheDaemon) {
-    writeScript(places_.systemctl,
-                "case \"$1 $3\" in \"restart \") sleep 3 ;; *ActiveState) echo inactive ;; esac\n");
-    SystemdBackend backend("ftpd", places_);
+TEST_F(SystemdTest, AStopOfAKilledSupervisorIsToldToSystemd) {
+    start("one");
+    killSupervisor();
+    forgetCalls();
+    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_TRUE(calls().starts_with("stop velt-sftp.service\n")) << "or the daemon would come back";
+    EXPECT_FALSE(accepts(port_));
+}
+
+TEST_F(SystemdTest, AFailedStartGivesTheDaemonsWords) {
+    EXPECT_LT(backend_->start(testPlan(port_, "one", {"--refuse", "fatal: no such certificate"})), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: fatal: no such certificate.");
+}
+
+TEST_F(SystemdTest, SystemdsOwnRefusalIsNamed) {
+    answerWith("[ $1 = restart ] || exit 0\necho 'Failed to restart: Unit is masked.' >&2; exit 1\n");
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: Failed to restart: Unit is masked.");
+    answerWith("[ $1 = daemon-reload ] && exit 3\nexit 0\n");
+    std::filesystem::remove(places_.units / "velt-sftp.service");
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: systemctl ended with status 3.");
+}
+
+TEST_F(SystemdTest, AnAnswerIsNotTakenForADaemon) {
+    answerWith("exit 0\n"); // as in a changed root, where systemctl ignores all requests
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(),
+              "The SFTP daemon does not start: systemd says that it has started it, but it does not serve.");
+}
+
+TEST_F(SystemdTest, AStartIsOverWithinFiveSeconds) {
+    answerWith("[ $1 = restart ] && exec sleep 20\nexit 0\n");
     const auto began = std::chrono::steady_clock::now();
-    EXPECT_LT(backend.start(testPlan(port_, "one")), 0);
-    EXPECT_LT(std::chrono::steady_clock::now() - began, std::chrono::milliseconds(6500));
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(5500));
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: its supervisor does not report in time.");
 }
 
 TEST_F(SystemdTest, WhatWasNeverStartedIsStoppedWithoutACall) {
-    SystemdBackend backend("ftpd", places_);
-    EXPECT_EQ(backend.stop(), 0) << lastErrorSentence();
-    EXPECT_EQ(backend.pause(), 0) << lastErrorSentence();
+    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_EQ(backend_->pause(), 0) << lastErrorSentence();
     EXPECT_EQ(calls(), "");
 }
 

@@ -27,6 +27,12 @@ TEST(SshdRendering, isAsRecordedWithoutRootsRights) {
     expectGolden(GOLDEN_FOLDER "/sftp_unprivileged.conf", renderSshd({true, 2222}, places));
 }
 
+TEST(SshdRendering, isAsRecordedForTheLoopbackOnly) {
+    SshdPlaces places = examplePlaces;
+    places.loopbackOnly = true;
+    expectGolden(GOLDEN_FOLDER "/sftp_loopback.conf", renderSshd({true, 2222}, places));
+}
+
 class SftpCandidate : public testing::Test {
 protected:
     void SetUp() override {

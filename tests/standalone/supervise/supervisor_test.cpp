@@ -68,6 +68,16 @@ TEST_F(SupervisorTest, ADaemonThatRefusesToStartSaysWhy) {
     EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, seconds(1)));
 }
 
+TEST_F(SupervisorTest, AdviceThatFollowsTheReasonDoesNotCrowdItOut) {
+    const std::string prefix = "2026-11-21 09:07:45,975 vm proftpd[28866]: ";
+    EXPECT_LT(backend_.start(testPlan(
+                  port_, "one",
+                  {"--refuse", prefix + "fatal: unknown configuration directive 'Prot'\n" + prefix +
+                                   "fatal: Did you mean:\n  Protocols\n  Port\n" + "  From\n  User"})),
+              0);
+    EXPECT_EQ(backend_.state().reason, "unknown configuration directive 'Prot'");
+}
+
 TEST_F(SupervisorTest, ALineThatWasCutShowsIt) {
     EXPECT_LT(backend_.start(testPlan(port_, "one", {"--refuse", "why: " + std::string(1000, 'x') + " end"})),
               0);

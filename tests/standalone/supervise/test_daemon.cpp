@@ -30,6 +30,10 @@ struct Options {
     bool any = false;
 };
 
+int number(const char* text) {
+    return static_cast<int>(std::strtol(text, nullptr, 10));
+}
+
 Options parse(int argc, char** argv) {
     Options options;
     for (int index = 1; index < argc; ++index) {
@@ -44,11 +48,11 @@ Options parse(int argc, char** argv) {
         }
         const char* value = index + 1 < argc ? argv[++index] : "";
         if (name == "--port") {
-            options.ports.push_back(std::atoi(value));
+            options.ports.push_back(number(value));
         } else if (name == "--delay") {
-            options.delay = std::atoi(value);
+            options.delay = number(value);
         } else if (name == "--live") {
-            options.live = std::atoi(value);
+            options.live = number(value);
         } else if (name == "--refuse") {
             options.words = value;
         }

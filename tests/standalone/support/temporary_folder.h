@@ -32,7 +32,7 @@ public:
 
     /// Writes a file below the folder, making the folders on the way.
     std::filesystem::path write(std::string_view below, std::string_view contents) const {
-        const std::filesystem::path file = path_ / std::filesystem::path(below).relative_path();
+        std::filesystem::path file = path_ / std::filesystem::path(below).relative_path();
         std::filesystem::create_directories(file.parent_path());
         std::ofstream(file, std::ios::binary | std::ios::trunc) << contents;
         return file;

@@ -6,8 +6,8 @@
 #include <sys/time.h>
 
 #include <array>
-#include <cstdio>
 #include <cstdlib>
+#include <sstream>
 
 namespace velt::test {
 namespace {
@@ -39,7 +39,9 @@ UniqueFd connectTo(const std::string& host, int port, const std::string& from) {
     setsockopt(connection.get(), SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit);
     if (!from.empty()) {
         const sockaddr_in own = addressOf(from, 0);
-        bind(connection.get(), reinterpret_cast<const sockaddr*>(&own), sizeof own);
+        if (bind(connection.get(), reinterpret_cast<const sockaddr*>(&own), sizeof own) < 0) {
+            return {};
+        }
     }
     const sockaddr_in address = addressOf(host, port);
     if (connect(connection.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) < 0) {
@@ -50,8 +52,8 @@ UniqueFd connectTo(const std::string& host, int port, const std::string& from) {
 
 std::string readToEnd(int connection) {
     std::string data;
-    std::array<char, 65536> buffer;
-    for (ssize_t count; (count = recv(connection, buffer.data(), buffer.size(), 0)) > 0;) {
+    std::array<char, 65536> buffer{};
+    for (ssize_t count = 0; (count = recv(connection, buffer.data(), buffer.size(), 0)) > 0;) {
         data.append(buffer.data(), static_cast<std::size_t>(count));
     }
     return data;
@@ -66,7 +68,7 @@ Reply FtpSession::read() {
     while (true) {
         const auto end = pending_.find("\r\n");
         if (end == std::string::npos) {
-            std::array<char, 4096> buffer;
+            std::array<char, 4096> buffer{};
             const ssize_t count = recv(connection_.get(), buffer.data(), buffer.size(), 0);
             if (count <= 0) {
                 return {};
@@ -78,8 +80,9 @@ Reply FtpSession::read() {
         pending_.erase(0, end + 2);
         reply.text += line + '\n';
         // "123-" goes on, "123 " ends.
-        if (line.size() > 3 && line[3] == ' ' && std::atoi(line.c_str()) >= 100) {
-            reply.code = std::atoi(line.c_str());
+        const long code = std::strtol(line.c_str(), nullptr, 10);
+        if (line.size() > 3 && line[3] == ' ' && code >= 100) {
+            reply.code = static_cast<int>(code);
             return reply;
         }
     }
@@ -96,12 +99,17 @@ int FtpSession::logIn(const std::string& user, const std::string& password) {
 
 std::optional<DataAddress> FtpSession::passive() {
     const Reply reply = command("PASV");
-    std::array<unsigned, 6> n{};
     const auto open = reply.text.find('(');
-    if (reply.code != 227 || open == std::string::npos ||
-        std::sscanf(reply.text.c_str() + open, "(%u,%u,%u,%u,%u,%u)", &n[0], &n[1], &n[2], &n[3], &n[4],
-                    &n[5]) != 6) {
+    if (reply.code != 227 || open == std::string::npos) {
         return std::nullopt;
+    }
+    std::istringstream address(reply.text.substr(open + 1));
+    std::array<unsigned, 6> n{};
+    char separator = ',';
+    for (unsigned& number : n) {
+        if (separator != ',' || !(address >> number >> separator)) {
+            return std::nullopt;
+        }
     }
     return DataAddress{std::to_string(n[0]) + '.' + std::to_string(n[1]) + '.' + std::to_string(n[2]) + '.' +
                            std::to_string(n[3]),

@@ -1,19 +1,16 @@
 #include "tests/system/support/module_service.h"
 
-#include "tests/system/support/daemon_process.h"
+#include "tests/system/support/leftovers.h"
 
 #include <json/reader.h>
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 
 #include <algorithm>
-#include <cctype>
 #include <chrono>
 #include <cstdlib>
 #include <memory>
-#include <thread>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -23,32 +20,6 @@ namespace {
 constexpr const char* ftpApi = "VELT.Core.FileServ.FTP";
 constexpr const char* securityApi = "VELT.Core.FileServ.FTP.Security";
 constexpr const char* sftpApi = "VELT.Core.FileServ.FTP.SFTP";
-
-/// What still runs in this world beside the test, by command.
-std::string processesLeft() {
-    // Whoever loses its parent here becomes the test's child.
-    while (waitpid(-1, nullptr, WNOHANG) > 0) {
-    }
-    std::string left;
-    for (const auto& entry : fs::directory_iterator("/proc")) {
-        const std::string name = entry.path().filename();
-        if (std::ranges::all_of(name, [](unsigned char c) { return std::isdigit(c) != 0; }) &&
-            std::stoi(name) != getpid()) {
-            left += name + " " + readFileText(entry.path() / "comm");
-        }
-    }
-    return left;
-}
-
-std::string lastingProcesses() {
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(3);
-    std::string left = processesLeft();
-    while (!left.empty() && std::chrono::steady_clock::now() < deadline) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-        left = processesLeft();
-    }
-    return left;
-}
 
 Json::Value dataOf(const ModuleAnswer& answer) {
     EXPECT_EQ(answer.code, 0) << answer.sentence;
@@ -91,8 +62,7 @@ void ModuleService::TearDown() {
     EXPECT_EQ(setSftp(R"({"enable": false})").code, 0) << lastErrorSentence();
     EXPECT_EQ(lastingProcesses(), "");
     EXPECT_EQ(readFileText("/proc/self/mounts"), mounts_);
-    EXPECT_FALSE(contains(readFileText("/proc/net/tcp") + readFileText("/proc/net/tcp6"), " 0A "))
-        << "something listens";
+    EXPECT_FALSE(somethingListens());
     clearFolders();
 }
 

@@ -1,0 +1,39 @@
+#include "standalone/supervise/service_manager.h"
+
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstddef>
+#include <cstdlib>
+#include <cstring>
+#include <string_view>
+
+namespace velt {
+
+void tellServiceManager(const std::string& assignments) {
+    const char* place = std::getenv("NOTIFY_SOCKET");
+    const std::string_view path = place == nullptr ? "" : place;
+    sockaddr_un address{};
+    if (path.empty() || path.size() >= sizeof address.sun_path) {
+        return;
+    }
+    address.sun_family = AF_UNIX;
+    path.copy(address.sun_path, path.size());
+    if (path.front() == '@') { // an address that is no file
+        address.sun_path[0] = '\0';
+    }
+    const auto size = static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + path.size());
+    const int descriptor = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+    if (descriptor < 0 || ::sendto(descriptor, assignments.data(), assignments.size(), MSG_NOSIGNAL,
+                                   reinterpret_cast<const sockaddr*>(&address), size) < 0) {
+        ::syslog(LOG_WARNING, "the service manager does not hear: %s", std::strerror(errno));
+    }
+    if (descriptor >= 0) {
+        ::close(descriptor);
+    }
+}
+
+} // namespace velt

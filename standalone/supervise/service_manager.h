@@ -1,0 +1,14 @@
+// Word to the service manager that started this process, after the protocol of sd_notify(3).
+#ifndef VELT_STANDALONE_SUPERVISE_SERVICE_MANAGER_H
+#define VELT_STANDALONE_SUPERVISE_SERVICE_MANAGER_H
+
+#include <string>
+
+namespace velt {
+
+/// Sends assignments like "READY=1", one a line. Nothing happens where no manager listens. Thread-safe.
+void tellServiceManager(const std::string& assignments);
+
+} // namespace velt
+
+#endif

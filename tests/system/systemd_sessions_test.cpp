@@ -1,0 +1,208 @@
+// SFTP sessions under a real systemd, whose login manager moves them out of the unit; other servers; a boot.
+#include "ftp/ftp_library.h"
+#include "platform/service.h"
+#include "platform/sftp.h"
+#include "standalone/core/last_error.h"
+#include "standalone/services/systemd_unit.h"
+#include "standalone/standalone.h"
+#include "tests/system/support/systemd_services.h"
+
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+using std::chrono::seconds;
+
+void startSftp() {
+    openMachine();
+    letAliceInByKey();
+    storeSftp(true);
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    ASSERT_NE(VELTSFTPIsAlive(), 0);
+}
+
+TEST_F(UnderSystemd, aTransferOutlivesAPauseAndAMove) {
+    inside([] {
+        startSftp();
+        SlowTransfer transfer(2222);
+        EXPECT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
+        EXPECT_EQ(VELTSFTPIsAlive(), 0);
+        EXPECT_NE(logInBySftp(2222).exitCode, 0);
+        EXPECT_EQ(unitProperty("velt-sftp.service", "StatusText"), "paused, only sessions of before go on");
+        storeSftp(true, 2223);
+        EXPECT_EQ(VLIBServiceResume("sftp"), 0) << lastErrorSentence();
+        EXPECT_EQ(logInBySftp(2223).exitCode, 0);
+        EXPECT_TRUE(transfer.succeeds());
+    });
+}
+
+TEST_F(UnderSystemd, aStopEndsSessionsWhereverTheyWereMoved) {
+    inside([] {
+        startSftp();
+        for (const bool paused : {false, true}) {
+            SlowTransfer transfer(2222);
+            const ServiceState state = serviceState("sftp");
+            if (fs::exists("/lib/systemd/system/systemd-logind.service")) {
+                const auto sessions = descendantsOf(state.daemon.pid);
+                ASSERT_FALSE(sessions.empty());
+                const std::string place = textOf("/proc/" + std::to_string(sessions[0].pid) + "/cgroup");
+                EXPECT_NE(place.find("/session-"), std::string::npos)
+                    << "not what this test is about: " << place;
+            }
+            if (paused) {
+                EXPECT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
+            }
+            EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+            EXPECT_FALSE(transfer.succeeds());
+            EXPECT_NE(runProcess({"pidof", "sshd"}).exitCode, 0) << "a session goes on";
+            EXPECT_EQ(unitState("velt-sftp.service"), "inactive");
+            ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+        }
+    });
+}
+
+TEST_F(UnderSystemd, aStopEndsTheSessionsOfAListenerThatCrashed) {
+    inside([] {
+        startSftp();
+        SlowTransfer transfer(2222);
+        const ProcessId listener = serviceState("sftp").daemon;
+        signalProcess(listener, SIGKILL);
+        ASSERT_TRUE(isBack("sftp", listener));
+        EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+        EXPECT_FALSE(transfer.succeeds());
+        EXPECT_NE(runProcess({"pidof", "sshd"}).exitCode, 0) << "a session goes on";
+    });
+}
+
+TEST_F(UnderSystemd, aStopEndsTheSessionsOfASupervisorThatWasKilled) {
+    inside([] {
+        startSftp();
+        SlowTransfer transfer(2222);
+        const ServiceState before = serviceState("sftp");
+        signalProcess(before.supervisor, SIGKILL);
+        ASSERT_TRUE(isBack("sftp", before.daemon));
+        EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+        EXPECT_FALSE(transfer.succeeds());
+        EXPECT_NE(runProcess({"pidof", "sshd"}).exitCode, 0) << "a session goes on";
+    });
+}
+
+/// The distribution's own server, which an administrator uses.
+class BesideTheStockServer : public UnderSystemd {
+protected:
+    void SetUp() override {
+        if (!fs::exists("/lib/systemd/system/ssh.service")) {
+            GTEST_SKIP() << "the distribution's SSH server has no unit here";
+        }
+        UnderSystemd::SetUp();
+    }
+
+    static void startStockServer() {
+        ASSERT_EQ(runProcess({"ssh-keygen", "-A"}).exitCode, 0);
+        ASSERT_EQ(runProcess({"systemctl", "start", "ssh.service"}).exitCode, 0);
+    }
+};
+
+TEST_F(BesideTheStockServer, itsPortIsRefusedAndItsSessionsAreLeftAlone) {
+    inside([] {
+        startSftp();
+        startStockServer();
+        SlowTransfer administrators(22);
+        storeSftp(true, 22);
+        EXPECT_LT(VLIBServiceStart("sftp", 0), 0);
+        EXPECT_NE(lastErrorSentence().find("Port 22 is in use by sshd"), std::string::npos)
+            << lastErrorSentence();
+        EXPECT_EQ(logInBySftp(2222).exitCode, 0) << "the former port is served on";
+        EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+        EXPECT_EQ(unitState("ssh.service"), "active");
+        EXPECT_TRUE(administrators.succeeds());
+    });
+}
+
+TEST_F(BesideTheStockServer, itsStopKeepsNobodyFromLoggingIn) {
+    inside([] {
+        startStockServer();
+        startSftp();
+        EXPECT_EQ(logInBySftp(2222).exitCode, 0);
+        ASSERT_EQ(runProcess({"systemctl", "stop", "ssh.service"}).exitCode, 0);
+        const ProcessResult login = logInBySftp(2222);
+        EXPECT_EQ(login.exitCode, 0) << login.errors << runProcess({"journalctl", "-u", "velt-sftp"}).output;
+    });
+}
+
+/// The host as a unit, as it is installed.
+void writeHostUnit() {
+    const std::string built = VELT_BUILT_FOLDER;
+    std::ofstream("/etc/systemd/system/veltd.service")
+        << "[Unit]\nAfter=network.target\n[Service]\nType=exec\nEnvironment=\"VELT_LIBEXEC_DIR=" << built
+        << "\"\nExecStart=\"" << built << "/veltd\" --module \"" << built
+        << "/VELT.Core.FileServ.FTP.so\"\n[Install]\nWantedBy=multi-user.target\n";
+}
+
+TEST_F(UnderSystemd, afterABootTheHostStartsWhatIsEnabled) {
+    inside([] {
+        openMachine();
+        storeFtp(VELT_FTP_SERVICE_TLS | VELT_FTP_SERVICE_PLAIN);
+        storeSftp(true);
+        writeHostUnit();
+        ASSERT_EQ(runProcess({"systemctl", "enable", "veltd.service"}).exitCode, 0);
+        EXPECT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+    });
+    reboot();
+    inside([] {
+        openMachine();
+        EXPECT_TRUE(comesTrue([] { return VELTSFTPIsAlive() != 0; }, seconds(10)));
+        EXPECT_EQ(fetchByFtp(), "alice");
+        const ProcessId ftp = serviceState("ftpd").daemon;
+        const ProcessId sftp = serviceState("sftp").daemon;
+        EXPECT_EQ(unitState("velt-ftpd.service"), "active");
+        EXPECT_EQ(unitState("velt-sftp.service"), "active");
+
+        ASSERT_EQ(runProcess({"systemctl", "restart", "veltd.service"}).exitCode, 0);
+        EXPECT_EQ(unitState("veltd.service"), "active");
+        EXPECT_EQ(fetchByFtp(), "alice");
+        EXPECT_EQ(serviceState("ftpd").daemon, ftp) << "the services do not depend on the host";
+        EXPECT_EQ(serviceState("sftp").daemon, sftp);
+        storeSftp(false);
+    });
+    reboot();
+    inside([] {
+        openMachine();
+        EXPECT_TRUE(comesTrue([] { return fetchByFtp() == "alice"; }, seconds(10)));
+        EXPECT_EQ(VELTSFTPIsAlive(), 0);
+        EXPECT_FALSE(fs::exists("/run/systemd/system/velt-sftp.service"));
+    });
+}
+
+TEST_F(UnderSystemd, quotedWordsArriveAsTheyAre) {
+    inside([] {
+        const std::vector<std::string> words{"a b",
+                                             "a\"b\\c",
+                                             "%h $HOME ${HOME}",
+                                             "a\nExecStart=/bin/x",
+                                             "",
+                                             ";",
+                                             "gr\xc3\xbc\xc3\x9f",
+                                             "# no comment",
+                                             "\x01\t'",
+                                             "\\",
+                                             "-"};
+        std::string line;
+        std::string expected;
+        for (const std::string& word : words) {
+            line += " " + quoteUnitWord(word);
+            expected += word + "|";
+        }
+        std::ofstream("/run/systemd/system/words.service")
+            << "[Service]\nType=oneshot\nStandardOutput=file:/run/words\n"
+            << "ExecStart=/usr/bin/printf \"%%s|\"" << line << '\n';
+        EXPECT_EQ(runProcess({"systemctl", "start", "words.service"}).exitCode, 0);
+        EXPECT_EQ(textOf("/run/words"), expected);
+    });
+}
+
+} // namespace
+} // namespace velt::test

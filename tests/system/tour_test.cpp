@@ -1,0 +1,220 @@
+// The quick start and the README's tour, as somebody does them who reads the page and copies its commands.
+#include "standalone/core/process.h"
+#include "tests/system/support/files.h"
+#include "tests/system/support/leftovers.h"
+#include "tests/system/support/private_world.h"
+#include "tests/system/support/readme_tour.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <map>
+#include <string>
+#include <vector>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+const fs::path sources = VELT_SOURCE_FOLDER;
+const std::string startBuilt = std::string("scripts/start --built ") + VELT_BUILT_FOLDER;
+
+class QuickStart : public testing::Test {
+protected:
+    void SetUp() override {
+        if (!whyNoWorld().empty()) {
+            GTEST_SKIP() << whyNoWorld();
+        }
+        furnishTree(tree_);
+    }
+    void TearDown() override {
+        if (!whyNoWorld().empty()) {
+            return;
+        }
+        run(tree_, "scripts/start --stop");
+        EXPECT_EQ(lastingProcesses(), "");
+        EXPECT_FALSE(somethingListens());
+        fs::remove_all(tree_);
+    }
+
+    /// What of the source tree the quick start uses: its script, and a file to send.
+    static void furnishTree(const fs::path& tree) {
+        fs::create_directories(tree);
+        fs::create_directory_symlink(sources / "scripts", tree / "scripts");
+        fs::copy_file(sources / "README.md", tree / "README.md");
+    }
+
+    /// Both outputs of the commands, which a shell runs in the folder.
+    static std::string run(const fs::path& folder, const std::string& commands,
+                           const std::vector<std::string>& before = {}) {
+        std::vector<std::string> arguments = before;
+        arguments.insert(arguments.end(),
+                         {"bash", "-c", "cd " + folder.string() + " && exec 2>&1\n" + commands});
+        const ProcessResult result = runProcess(arguments, {}, std::chrono::seconds(60));
+        return result.output + result.errors;
+    }
+
+    const fs::path tree_ = "/mnt/tour";
+};
+
+std::string replaced(std::string text, const std::string& from, const std::string& to) {
+    const auto at = text.find(from);
+    return at == std::string::npos ? text : text.replace(at, from.size(), to);
+}
+
+bool contains(const std::string& text, const std::string& part) {
+    return text.find(part) != std::string::npos;
+}
+
+// One shell runs all steps, as for somebody who copies them one after the other.
+std::vector<std::string> outputsOf(const std::string& all, std::size_t steps) {
+    std::vector<std::string> outputs;
+    for (std::size_t i = 0; i < steps; i++) {
+        const std::string mark = "== step " + std::to_string(i) + "\n";
+        const auto begin = all.find(mark);
+        if (begin == std::string::npos) {
+            ADD_FAILURE() << "step " << i << " was not reached:\n" << all;
+            outputs.emplace_back();
+            continue;
+        }
+        const auto end = all.find("== step " + std::to_string(i + 1) + "\n", begin);
+        outputs.push_back(all.substr(begin + mark.size(), end - begin - mark.size()));
+    }
+    return outputs;
+}
+
+TEST_F(QuickStart, theTourGoesAsTheReadmeSays) {
+    const std::string page = readFileText(sources / "README.md");
+    const std::vector<TourStep> steps = stepsOf(page);
+    ASSERT_GE(steps.size(), 6U);
+    std::string commands;
+    for (std::size_t i = 0; i < steps.size(); i++) {
+        commands += "echo '== step " + std::to_string(i) + "'\n" +
+                    replaced(steps[i].commands, "scripts/start\n", startBuilt + "\n");
+    }
+    const std::vector<std::string> outputs = outputsOf(run(tree_, commands), steps.size());
+    if (std::getenv("VELT_UPDATE_GOLDEN") != nullptr) {
+        writeFile(sources / "README.md", withOutputs(page, outputs));
+        FAIL() << "wrote README.md";
+    }
+    for (std::size_t i = 0; i < steps.size(); i++) {
+        EXPECT_EQ(masked(outputs[i]), masked(steps[i].output)) << "after:\n" << steps[i].commands;
+    }
+}
+
+TEST_F(QuickStart, aSecondStartChangesNothing) {
+    const std::string first = run(tree_, startBuilt);
+    const std::string settings = run(tree_, ". var/env; veltctl ftp set enable_ftp=on; veltctl export");
+    const std::string process = readFileText(tree_ / "var/veltd.pid");
+    const std::string second = run(tree_, startBuilt);
+    EXPECT_TRUE(contains(second, "veltd runs already, as process ")) << second;
+    EXPECT_TRUE(contains(second, "127.0.0.1:2121, on and off")) << second;
+    EXPECT_EQ(readFileText(tree_ / "var/veltd.pid"), process);
+    EXPECT_EQ("enable_ftp: off -> on\n" + run(tree_, ". var/env; veltctl export"), settings);
+    EXPECT_EQ(modeOf(tree_ / "var/token"), 0600U);
+    EXPECT_EQ(modeOf(tree_ / "var/env"), 0600U);
+}
+
+TEST_F(QuickStart, whatWasOnIsOnAgainAfterAStop) {
+    run(tree_,
+        startBuilt + "; . var/env; veltctl ftp set enable_ftp=on portnum=2100; veltctl sftp set enable=on");
+    EXPECT_EQ(run(tree_, "scripts/start --stop"),
+              "veltd and its services are stopped; var/ keeps their settings.\n");
+    EXPECT_EQ(lastingProcesses(), "");
+    const std::string again = run(tree_, startBuilt);
+    EXPECT_TRUE(contains(again, "127.0.0.1:2100, on and off")) << again;
+    EXPECT_TRUE(contains(again, "127.0.0.1:2222, on")) << again;
+    EXPECT_EQ(run(tree_, "curl -sS ftp://127.0.0.1:2100/"), "");
+}
+
+TEST_F(QuickStart, takesOtherPortsWhereItsOwnAreTaken) {
+    const fs::path other = "/mnt/other";
+    furnishTree(other);
+    run(other, startBuilt + "; . var/env; veltctl ftp set enable_ftp=on; veltctl sftp set enable=on");
+    const std::string second = run(tree_, startBuilt);
+    EXPECT_TRUE(contains(second, "http://127.0.0.1:8081,")) << second;
+    EXPECT_TRUE(contains(second, "127.0.0.1:2122, off")) << second;
+    EXPECT_TRUE(contains(second, "127.0.0.1:2223, off")) << second;
+    EXPECT_TRUE(contains(run(other, "scripts/start --stop"), "stopped"));
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd runs already"))
+        << "it was not the one that was stopped";
+    fs::remove_all(other);
+}
+
+TEST_F(QuickStart, worksBelowAClosedFolder) {
+    const fs::path closed = "/mnt/closed";
+    furnishTree(closed / "tree");
+    fs::permissions(closed, fs::perms::owner_all);
+    const std::string mounts = readFileText("/proc/self/mounts");
+    const std::string start = run(closed / "tree", startBuilt);
+    EXPECT_EQ(run(closed / "tree",
+                  ". var/env; veltctl ftp set enable_ftp=on; curl -sS -T README.md ftp://127.0.0.1:2121/"),
+              "enable_ftp: off -> on\n")
+        << start;
+    EXPECT_EQ(readFileText(closed / "tree/var/demo/README.md"), readFileText(sources / "README.md"));
+    EXPECT_EQ(readFileText("/proc/self/mounts"), mounts);
+    run(closed / "tree", "scripts/start --stop");
+    fs::remove_all(closed);
+}
+
+TEST_F(QuickStart, worksWithoutRootsRights) {
+    ASSERT_EQ(chown(tree_.c_str(), carolId, carolId), 0);
+    const std::vector<std::string> asCarol{"setpriv", "--reuid", "carol",
+                                           "--regid", "carol",   "--clear-groups"};
+    const std::string start = run(tree_, startBuilt, asCarol);
+    EXPECT_TRUE(contains(start, "for the user demo with the password ")) << start;
+    // The third of the commands that it proposes.
+    const std::string upload =
+        run(tree_,
+            ". var/env; veltctl ftp set enable_ftp=on; " +
+                start.substr(start.find("curl -T"),
+                             start.find('\n', start.find("curl -T")) - start.find("curl -T")) +
+                " -sS",
+            asCarol);
+    EXPECT_EQ(upload, "enable_ftp: off -> on\n");
+    EXPECT_EQ(readFileText(tree_ / "var/demo/README.md"), readFileText(sources / "README.md"));
+    EXPECT_EQ(modeOf(tree_ / "var/demo-password"), 0600U);
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "var/ was made by carol."))
+        << "root takes over what is carol's";
+}
+
+// Every file below the folder, with its size and the time of its last change.
+std::map<std::string, std::string> stateOf(const fs::path& folder) {
+    std::map<std::string, std::string> state;
+    std::error_code error;
+    for (fs::recursive_directory_iterator entry(folder, error), end; !error && entry != end;
+         entry.increment(error)) {
+        struct stat facts {};
+        if (lstat(entry->path().c_str(), &facts) == 0 && !S_ISDIR(facts.st_mode)) {
+            state[entry->path()] = std::to_string(facts.st_size) + " " +
+                                   std::to_string(facts.st_ctim.tv_sec) + "." +
+                                   std::to_string(facts.st_ctim.tv_nsec);
+        }
+    }
+    return state;
+}
+
+TEST_F(QuickStart, writesNothingOutsideItsTree) {
+    const std::vector<std::string> folders{"/etc",       "/home",    "/media",        "/mnt/home",
+                                           "/opt",       "/root",    "/run",          "/srv",
+                                           "/usr/local", "/var/log", "/var/lib/velt", "/var/spool"};
+    std::map<std::string, std::map<std::string, std::string>> before;
+    for (const std::string& folder : folders) {
+        before[folder] = stateOf(folder);
+    }
+    run(tree_, startBuilt +
+                   "; . var/env; veltctl ftp set enable_ftp=on enable_ftps=on; veltctl sftp set enable=on;"
+                   "curl -sS -T README.md ftp://127.0.0.1:2121/; scripts/start --stop");
+    ASSERT_TRUE(fs::exists(tree_ / "var/demo/README.md"));
+    for (const std::string& folder : folders) {
+        EXPECT_EQ(stateOf(folder), before[folder]) << folder;
+    }
+    const std::string tables = run(tree_, "nft list tables");
+    EXPECT_EQ(tables, "");
+}
+
+} // namespace
+} // namespace velt::test
