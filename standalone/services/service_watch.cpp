@@ -1,8 +1,8 @@
 // Supervisors look after daemons; this looks after supervisors.
 #include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/state_root.h"
 #include "standalone/services/daemon_control.h"
+#include "standalone/services/service_backend.h"
 #include "standalone/standalone.h"
 
 #include <syslog.h>
@@ -30,9 +30,7 @@ public:
     explicit WatchedDaemon(Daemon daemon) : daemon_(daemon) {}
 
     void look() {
-        // Only supervisors write these files, so where systemd runs the daemons there is nothing to be seen.
-        const ServiceState state =
-            readServiceState(stateFile(statePath("/run/velt"), daemonName(daemon_))).value_or(ServiceState{});
+        const ServiceState state = daemonState(daemon_);
         const bool lost = lostItsSupervisor(state);
         if (lost && !retryAt_) {
             ::syslog(LOG_ERR, "the supervisor of %s, process %d, has ended: the daemon is started again",
@@ -116,7 +114,7 @@ TheWatch& theWatch() {
 int watchServices() {
     return atBoundary([] {
         const std::lock_guard lock(theWatch().mutex);
-        if (theWatch().watch == nullptr) {
+        if (theWatch().watch == nullptr && !systemdKeepsSupervisors()) {
             theWatch().watch = std::make_unique<ServiceWatch>();
         }
         return 0;
