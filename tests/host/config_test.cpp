@@ -9,6 +9,7 @@
 
 #include <cerrno>
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <thread>
 
@@ -43,7 +44,7 @@ TEST(Config, TheDefaultsAreTheDocumentedLimits) {
 }
 
 TEST(Config, TheCommandLineGoesBeforeTheFile) {
-    std::string file = "/tmp/velt-config-XXXXXX";
+    std::string file = (std::filesystem::temp_directory_path() / "velt-config-XXXXXX").string();
     const int descriptor = mkstemp(file.data());
     ASSERT_GE(descriptor, 0);
     std::ofstream(file) << R"({"module": ["a.so"], "listen": ["127.0.0.1:1", "[::1]:1"], "max-body": 4096,
