@@ -107,7 +107,8 @@ void ModuleService::makeShares() {
         writeFile(folder / "about", name);
         const char* grant = name == "public" ? "read" : name == "upload" ? "write" : "none";
         text += (text.empty() ? "" : ",") + (R"({"name": ")" + name) + R"(", "path": ")" + folder.string() +
-                R"(", "ftp": true, "users": {"ftp": ")" + grant + R"("}})";
+                R"(", "ftp": true, "users": {"ftp": ")" + grant +
+                R"(", "alice": "write", "bob": "write", "carol": "write"}})";
     }
     fs::create_directories(worldRoot / "etc/velt");
     writeFile(worldRoot / "etc/velt/shares.json", R"({"version": 1, "shares": [)" + text + "]}\n");

@@ -42,7 +42,8 @@ protected:
     static Json::Value json(const std::string& text);
 
     /// Writes the file of the shares: "public" (anonymous users read it), "music", "upload" (they write) and
-    /// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name.
+    /// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name. Alice,
+    /// bob and carol may write in all of them.
     static void makeShares();
 
     /// What alice gets when she fetches the file of her home; "" when she is refused.
