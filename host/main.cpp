@@ -92,6 +92,9 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     if (!velt::host::startEnabledServices(error)) {
         log.write("not every enabled service started: " + error);
     }
+    if (!velt::host::watchServices(error)) {
+        log.write("nobody watches the services: " + error);
+    }
     server.start(config.ioThreads);
     if (config.printReady) {
         std::printf("%s\n", velt::host::toJson(ready).c_str());
@@ -102,6 +105,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     log.write("stopping");
     server.stop(config.stopTime);
     app.stop();
+    velt::host::unwatchServices();
     log.write("stopped");
 }
 

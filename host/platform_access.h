@@ -64,6 +64,11 @@ bool openPlatform(const std::filesystem::path& stateRoot, std::string& error);
 /// the others run.
 bool startEnabledServices(std::string& error);
 
+/// Brings daemons back whose supervisors were killed, from now on until unwatchServices. False, with the
+/// reason in `error`, when that is impossible.
+bool watchServices(std::string& error);
+void unwatchServices();
+
 /// A service that the settings enable and that does not follow them.
 struct ServiceDown {
     std::string service;               ///< "ftp" (with FTPS) or "sftp"
