@@ -123,8 +123,15 @@ int makeRulesFile() {
     if (!lock) {
         return -1;
     }
+    // A file that is there and cannot be read, or a link to a disk that is not mounted, holds rules that an
+    // empty set would take away.
     std::error_code error;
-    return std::filesystem::exists(rulesFile(), error) ? 0 : saveRules({});
+    if (std::filesystem::symlink_status(rulesFile(), error).type() == std::filesystem::file_type::not_found) {
+        return saveRules({});
+    }
+    return std::filesystem::exists(rulesFile(), error)
+               ? 0
+               : fail(ErrorNumber::store, "The file " + rulesFile().string() + " cannot be reached.");
 }
 
 } // namespace velt

@@ -96,7 +96,7 @@ bool showInShare(const Login& login, const std::filesystem::path& root, const st
     if (access == Access::none) {
         return refuse("The share " + share->name + " grants no access.");
     }
-    UniqueFd folder = openFolder(share->path);
+    UniqueFd folder = openFolderAs(login, share->path);
     const auto outer = folder ? placeOf(folder) : std::filesystem::path();
     if (folder && end < path.size()) {
         folder = openFolderBelow(login, folder, path.substr(end + 1));
@@ -107,7 +107,7 @@ bool showInShare(const Login& login, const std::filesystem::path& root, const st
     return showOne(root, std::move(folder), outer, access, grants);
 }
 
-bool showShares(const std::filesystem::path& root, const std::vector<ShareEntry>& shares,
+bool showShares(const Login& login, const std::filesystem::path& root, const std::vector<ShareEntry>& shares,
                 const Grants& grants, std::vector<std::string>& remarks) {
     SideBySide view(root);
     if (!view.begin()) {
@@ -118,7 +118,7 @@ bool showShares(const std::filesystem::path& root, const std::vector<ShareEntry>
         if (access == Access::none) {
             continue;
         }
-        UniqueFd folder = openFolder(share.path);
+        UniqueFd folder = openFolderAs(login, share.path);
         const auto place = folder ? placeOf(folder) : std::filesystem::path();
         if (place.empty()) {
             remarks.push_back("The share " + share.name + " is left out: its folder cannot be opened.");
@@ -134,7 +134,7 @@ bool showToAnonymous(const Login& login, const std::filesystem::path& root,
                      const std::vector<ShareEntry>& shares, const Grants& grants,
                      std::vector<std::string>& remarks) {
     if (login.anonymousShare.empty()) {
-        return showShares(root, shares, grants, remarks);
+        return showShares(login, root, shares, grants, remarks);
     }
     const auto name = readTrusted(login.anonymousShare);
     if (!name) {
@@ -169,8 +169,9 @@ bool makeLoginRoot(const Login& login, const std::filesystem::path& root, std::v
     if (!rule->empty() && *rule != homePath) {
         return showInShare(login, root, *rule, *shares, grants);
     }
-    return rule->empty() && login.kind == LoginKind::shares ? showShares(root, *shares, grants, remarks)
-                                                            : showHome(login, root, grants);
+    return rule->empty() && login.kind == LoginKind::shares
+               ? showShares(login, root, *shares, grants, remarks)
+               : showHome(login, root, grants);
 }
 
 } // namespace velt

@@ -15,7 +15,8 @@ namespace velt {
 /// With root's rights and through all symbolic links.
 UniqueFd openFolder(const std::filesystem::path& path);
 
-/// With the rights of the login, for a path that the login may have laid itself.
+/// With the rights of the login, for a path that the login may have laid itself: a home, or a share within
+/// one that the login may write.
 UniqueFd openFolderAs(const Login& login, const std::filesystem::path& path);
 
 /// With the rights of the login, and never outside of `folder`, whoever moves folders and links meanwhile.

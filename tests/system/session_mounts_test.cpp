@@ -91,5 +91,35 @@ TEST_F(SessionMounts, areOfTheRightFolderWhileSomebodyMovesIt) {
     EXPECT_GT(granted, 0);
 }
 
+TEST_F(SessionMounts, areOfNoClosedFolderWhileSomebodyMovesAShare) {
+    const auto music = share("music", {{"alice", write}});
+    const auto inner = share("inner", {{"alice", write}}, {}, music / "inner");
+    fs::create_directories("/mnt/closed/open");
+    writeFile("/mnt/closed/open/wrong", "x");
+    fs::permissions("/mnt/closed", fs::perms(0700));
+    start();
+    saveRules({"u:1001:/inner"});
+    std::atomic<bool> done = false;
+    // Each moment there stands either the folder or a link to one that alice cannot get to.
+    std::thread mover([&] {
+        fs::create_directory_symlink("/mnt/closed/open", music / "link");
+        while (!done) {
+            renameat2(AT_FDCWD, inner.c_str(), AT_FDCWD, (music / "link").c_str(), RENAME_EXCHANGE);
+            std::this_thread::sleep_for(std::chrono::microseconds(300));
+        }
+    });
+    int granted = 0;
+    for (int i = 0; i < 40; i++) {
+        FtpSession session(port);
+        if (session.logIn("alice") == 230) {
+            granted++;
+            EXPECT_EQ(seenIn(session, "/"), "file");
+        }
+    }
+    done = true;
+    mover.join();
+    EXPECT_GT(granted, 0);
+}
+
 } // namespace
 } // namespace velt::test

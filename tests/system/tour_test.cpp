@@ -51,7 +51,7 @@ protected:
         std::vector<std::string> arguments = before;
         arguments.insert(arguments.end(),
                          {"bash", "-c", "cd " + folder.string() + " && exec 2>&1\n" + commands});
-        const ProcessResult result = runProcess(arguments, {}, std::chrono::seconds(60));
+        const ProcessResult result = runProcess(arguments, {}, std::chrono::seconds(100));
         return result.output + result.errors;
     }
 
@@ -166,6 +166,16 @@ TEST_F(QuickStart, servesWhoeverBecameRootForTheStart) {
                   {"setpriv", "--reuid", "alice", "--regid", "alice", "--clear-groups"}),
               R"({"status":"ok"})");
     EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd runs already"));
+}
+
+TEST_F(QuickStart, saysWhenFtpCannotWork) {
+    const std::vector<std::string> withoutMounts{"setpriv", "--bounding-set", "-sys_admin", "--inh-caps",
+                                                 "-sys_admin"};
+    EXPECT_TRUE(contains(run(tree_, startBuilt, withoutMounts), "FTP will not start here: as root "));
+    const std::string use =
+        run(tree_, ". var/env; veltctl ftp set enable_ftp=on; veltctl sftp set enable=on", withoutMounts);
+    EXPECT_TRUE(contains(use, "mounts of their own are not possible")) << use;
+    EXPECT_TRUE(contains(use, "enable: off -> on")) << use;
 }
 
 TEST_F(QuickStart, worksWithoutRootsRights) {

@@ -72,6 +72,18 @@ TEST_F(RuleStore, isMadeOnceAndThenLeftAlone) {
     EXPECT_EQ(loadRules()->size(), 1U);
 }
 
+TEST_F(RuleStore, isNotMadeAnewWhereItsFileCannotBeReached) {
+    ASSERT_EQ(saveRules({{true, 1, "/home"}}), 0);
+    const auto file = root_.path() / "etc/velt/chroot_rules";
+    std::filesystem::rename(file, root_.path() / "disk");
+    std::filesystem::create_symlink(root_.path() / "disk", file);
+    std::filesystem::rename(root_.path() / "disk", root_.path() / "away");
+    EXPECT_LT(makeRulesFile(), 0);
+    EXPECT_NE(lastErrorSentence().find("chroot_rules"), std::string::npos) << lastErrorSentence();
+    std::filesystem::rename(root_.path() / "away", root_.path() / "disk");
+    EXPECT_EQ(loadRules()->size(), 1U);
+}
+
 TEST_F(RuleStore, namesTheLineThatIsDamaged) {
     const std::pair<const char*, const char*> cases[] = {
         {"", "Line 1 of "},
