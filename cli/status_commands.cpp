@@ -18,8 +18,25 @@ namespace {
 
 // A service that is to run and does not is what an administrator looks for.
 std::string stateOf(const Json::Value& service) {
-    const bool down = service.isObject() && service["wanted"] == true && service["enabled"] == false;
-    return down ? "down" : textAt(service, "enabled");
+    if (!service.isObject() || service["running"] != false) {
+        return textAt(service, "enabled");
+    }
+    const bool shallRun = service["wanted"] == true || service["enabled"] == true;
+    return shallRun ? "down" : textAt(service, "enabled");
+}
+
+/// Why services do not follow their settings; those of one daemon have one reason.
+void writeReasons(Session& session, const Json::Value& services) {
+    std::string last;
+    for (const Json::Value& service : services) {
+        const bool given = service.isObject() && service["reason"].isString();
+        const std::string reason = given ? service["reason"].asString() : "";
+        if (!reason.empty() && reason != last) {
+            session.console.out << '\n'
+                                << printable(textAt(service, "name")) << ": " << printable(reason) << '\n';
+        }
+        last = reason;
+    }
 }
 
 void showStatus(Session& session) {
@@ -35,6 +52,7 @@ void showStatus(Session& session) {
         table.add({textAt(service, "name"), stateOf(service), textAt(service, "port")});
     }
     table.write(session.console.out);
+    writeReasons(session, status["services"]);
 }
 
 struct EventOptions {

@@ -177,7 +177,8 @@ void readFile(Config& config, const std::string& file) {
         throw ConfigError("The configuration file " + file + " is no JSON object: " + parsed.error + ".");
     }
     for (const std::string& name : parsed.value.getMemberNames()) {
-        const std::string place = "The configuration file " + file + ": \"" + name + "\"";
+        std::string place = "The configuration file " + file;
+        place.append(": \"").append(name).append("\"");
         const Setting* const setting = settingNamed(name);
         if (setting == nullptr) {
             throw ConfigError(place + " is no setting. --help lists them.");

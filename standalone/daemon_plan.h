@@ -23,11 +23,11 @@ struct DaemonPlan {
 };
 
 /// Renders, tests and writes the configuration that follows from the stored settings, and all that it needs:
-/// certificate or host keys, links, the map of shares. A configuration has a folder of its own, so that a
+/// certificate or host keys, the folder of logins. A configuration has a folder of its own, so that a
 /// daemon which runs for a former one can be started again for that one; what all of them read at logins is
 /// replaced atomically. So this may be called while the daemon runs. Nothing, with the last error set, when
-/// the settings cannot be read, enable neither FTP nor FTPS, or are refused by the daemon's own test.
-/// Thread-safe.
+/// the settings cannot be read, enable neither FTP nor FTPS, or are refused by the daemon's own test, or when
+/// root may not make the mounts here that confine each session. Thread-safe.
 std::optional<DaemonPlan> planFtpDaemon();
 
 /// The same for SFTP, whatever the stored enable flag says.
@@ -36,10 +36,6 @@ std::optional<DaemonPlan> planSftpDaemon();
 /// Removes what former configurations left beside the folder of this one. To be called when its daemon
 /// serves, since before that the former one may be wanted again.
 void removeFormerPlans(const DaemonPlan& plan);
-
-/// Writes anew the map from share names to folders that the running FTP daemon consults at each login. To be
-/// called after the shares have changed. Negative on failure, with the last error set.
-int refreshShareMap();
 
 } // namespace velt
 

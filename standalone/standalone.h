@@ -1,9 +1,9 @@
 // What the platform library offers the program that loads the module over it, beside the contract.
 //
-// A host, at its start: openState, the subscriptions, startEnabledServices. Then, for each request, on the
-// thread that serves it: setRequestActor, clearLastError, the module's entry function, and after a failure
-// lastErrorSentence or lastPortConflict for the answer. A change that was accepted is in force when
-// servicesDown is empty after it.
+// A host, at its start: openState, the subscriptions, startEnabledServices, watchServices. Then, for each
+// request, on the thread that serves it: setRequestActor, clearLastError, the module's entry function, and
+// after a failure lastErrorSentence or lastPortConflict for the answer. A change that was accepted is in
+// force when servicesDown is empty after it.
 //
 // Functions with an int result return a negative one on failure, with the last error set. Unless it says
 // otherwise a function may be called from any thread.
@@ -35,6 +35,17 @@ int openState(const std::filesystem::path& root);
 /// daemon accepts connections or has failed. One that fails does not keep the others from starting; the
 /// result is then negative.
 int startEnabledServices();
+
+/// Looks, twice a second and on a thread of its own, whether the supervisors of the daemons live, and starts
+/// what lost its supervisor again with the stored settings (ended, where these have switched it off): its
+/// sessions are cut. A supervisor brings back a daemon that dies; killed itself, it cannot, and its daemon's
+/// words go nowhere. Where systemd keeps the supervisors, it does this alone. A second call does nothing. No
+/// process may fork a child that goes on with this library while it watches.
+int watchServices();
+
+/// Ends the watch, if there is one, and waits for what it does at the moment. To be called before the process
+/// ends.
+void unwatchServices();
 
 /// A service that the stored settings enable and that does not follow them.
 struct ServiceDown {

@@ -29,12 +29,6 @@ constexpr std::array<ModuleName, 3> moduleNames{{
 
 using Modules = std::vector<std::shared_ptr<const NameService>>;
 
-/// What the domain and LDAP sources said.
-struct Remote {
-    Modules modules;
-    std::vector<UserEntry> users;
-};
-
 /// What is known of the accounts, and when it was learned. Files are read under the lock, so that a change of
 /// a large one is read once, whoever asks. A domain may take long to answer or not answer at all: it is asked
 /// outside of the lock, by one thread at a time, and the others go on with what it said before.
@@ -47,7 +41,7 @@ public:
 
 private:
     void refreshRemote();
-    bool remoteIsCurrent() const;
+    bool isCurrent(const std::optional<Clock::time_point>& readAt) const;
 
     std::mutex remoteReading_; ///< taken before mutex_ where both are
     std::mutex mutex_;
@@ -58,7 +52,9 @@ private:
     FileStamp passwdStamp_;
     FileStamp loginDefsStamp_;
     FileStamp groupStamp_;
-    Remote remote_;
+    Modules modules_; ///< of the domain and LDAP sources in use
+    std::optional<Clock::time_point> modulesReadAt_;
+    std::vector<UserEntry> remoteUsers_; ///< those that these sources told of
     std::optional<Clock::time_point> remoteReadAt_;
 };
 
@@ -73,17 +69,19 @@ void Directory::setSources(AccountSources sources) {
     ++sourcesNumber_;
     users_.reset();
     groups_.reset();
+    modulesReadAt_.reset();
+    modules_ = {};
     remoteReadAt_.reset();
-    remote_ = {};
+    remoteUsers_ = {};
 }
 
-bool Directory::remoteIsCurrent() const {
-    return remoteReadAt_ && Clock::now() - *remoteReadAt_ < sources_.remoteLifetime;
+bool Directory::isCurrent(const std::optional<Clock::time_point>& readAt) const {
+    return readAt && Clock::now() - *readAt < sources_.remoteLifetime;
 }
 
-Remote readRemote(const AccountSources& sources) {
+Modules loadModules(const AccountSources& sources) {
     const std::string configuration = readFile(sources.nsswitch).value_or("");
-    Remote remote;
+    Modules modules;
     for (const ModuleName& module : moduleNames) {
         // A module that is installed but not in use knows accounts that cannot log in.
         if (!nsswitchNames(configuration, "passwd", module.name)) {
@@ -91,15 +89,21 @@ Remote readRemote(const AccountSources& sources) {
         }
         std::shared_ptr<const NameService> service =
             NameService::load(sources.moduleFolder, module.name, module.source);
-        if (service == nullptr) {
-            continue;
+        if (service != nullptr) {
+            modules.push_back(std::move(service));
         }
-        for (UserEntry& user : service->users()) {
-            remote.users.push_back(std::move(user));
-        }
-        remote.modules.push_back(std::move(service));
     }
-    return remote;
+    return modules;
+}
+
+std::vector<UserEntry> usersOf(const Modules& modules) {
+    std::vector<UserEntry> users;
+    for (const auto& module : modules) {
+        for (UserEntry& user : module->users()) {
+            users.push_back(std::move(user));
+        }
+    }
+    return users;
 }
 
 void Directory::refreshRemote() {
@@ -114,21 +118,20 @@ void Directory::refreshRemote() {
         reading.lock();
     }
     std::unique_lock lock(mutex_);
-    if (remoteIsCurrent()) {
+    if (isCurrent(remoteReadAt_)) {
         return;
     }
-    const AccountSources sources = sources_;
     const unsigned number = sourcesNumber_;
     lock.unlock();
-    Remote remote = readRemote(sources);
+    std::vector<UserEntry> users = usersOf(modules());
     lock.lock();
     if (number != sourcesNumber_) {
         return;
     }
-    if (!remote_.users.empty() || !remote.users.empty()) {
+    if (!remoteUsers_.empty() || !users.empty()) {
         users_.reset();
     }
-    remote_ = std::move(remote);
+    remoteUsers_ = std::move(users);
     remoteReadAt_ = Clock::now();
 }
 
@@ -140,7 +143,7 @@ std::shared_ptr<const UserSnapshot> Directory::users() {
     if (users_ != nullptr && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
         return users_;
     }
-    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remote_.users,
+    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remoteUsers_,
                                 parseLoginDefs(readFile(sources_.loginDefs).value_or("")));
     passwdStamp_ = passwd;
     loginDefsStamp_ = loginDefs;
@@ -157,10 +160,15 @@ std::shared_ptr<const GroupSnapshot> Directory::groups() {
     return groups_;
 }
 
+// Nobody has to wait for a listing of users who looks up one account: each login to the FTP daemon is a
+// process of its own, for which that would be the first one.
 Modules Directory::modules() {
-    refreshRemote();
     const std::lock_guard lock(mutex_);
-    return remote_.modules;
+    if (!isCurrent(modulesReadAt_)) {
+        modules_ = loadModules(sources_);
+        modulesReadAt_ = Clock::now();
+    }
+    return modules_;
 }
 
 char lower(char character) {

@@ -4,7 +4,6 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemon_plan.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -28,30 +27,6 @@ std::optional<std::vector<ChrootRule>> damaged(int lineNumber) {
     fail(ErrorNumber::damaged,
          "Line " + std::to_string(lineNumber) + " of " + rulesFile().string() + " is damaged.");
     return std::nullopt;
-}
-
-std::optional<std::vector<ChrootRule>> parseRules(std::string_view text) {
-    std::vector<ChrootRule> rules;
-    for (int number = 1; number == 1 || !text.empty(); number++) {
-        const auto end = text.find('\n');
-        if (end == std::string_view::npos) {
-            return damaged(number);
-        }
-        const auto line = text.substr(0, end);
-        text.remove_prefix(end + 1);
-        if (number == 1) {
-            if (line != versionLine) {
-                return damaged(number);
-            }
-            continue;
-        }
-        auto rule = parseRule(line);
-        if (!rule) {
-            return damaged(number);
-        }
-        rules.push_back(std::move(*rule));
-    }
-    return rules;
 }
 
 } // namespace
@@ -92,6 +67,30 @@ std::optional<ChrootRule> parseRule(std::string_view line) {
     return isRulePath(rule.path) && formatRule(rule) == line ? std::optional(std::move(rule)) : std::nullopt;
 }
 
+std::optional<std::vector<ChrootRule>> parseRules(std::string_view text) {
+    std::vector<ChrootRule> rules;
+    for (int number = 1; number == 1 || !text.empty(); number++) {
+        const auto end = text.find('\n');
+        if (end == std::string_view::npos) {
+            return damaged(number);
+        }
+        const auto line = text.substr(0, end);
+        text.remove_prefix(end + 1);
+        if (number == 1) {
+            if (line != versionLine) {
+                return damaged(number);
+            }
+            continue;
+        }
+        auto rule = parseRule(line);
+        if (!rule) {
+            return damaged(number);
+        }
+        rules.push_back(std::move(*rule));
+    }
+    return rules;
+}
+
 std::optional<std::vector<ChrootRule>> loadRules() {
     const auto text = readFile(rulesFile());
     if (text) {
@@ -112,19 +111,11 @@ int saveRules(const std::vector<ChrootRule>& rules) {
         text += formatRule(rule);
         text += '\n';
     }
-    const bool namesShare =
-        std::ranges::any_of(rules, [](const ChrootRule& rule) { return rule.path != homePath; });
     const StateLock lock;
     if (!lock) {
         return -1;
     }
-    return perform(Effect::store, "chroot rules", [&] {
-        // The daemon finds a share by its map, which an edit of the shares by hand has left behind.
-        if (namesShare && refreshShareMap() < 0) {
-            return -1;
-        }
-        return replaceFile(rulesFile(), text, 0600);
-    });
+    return perform(Effect::store, "chroot rules", [&text] { return replaceFile(rulesFile(), text, 0600); });
 }
 
 int makeRulesFile() {
@@ -132,8 +123,15 @@ int makeRulesFile() {
     if (!lock) {
         return -1;
     }
+    // A file that is there and cannot be read, or a link to a disk that is not mounted, holds rules that an
+    // empty set would take away.
     std::error_code error;
-    return std::filesystem::exists(rulesFile(), error) ? 0 : saveRules({});
+    if (std::filesystem::symlink_status(rulesFile(), error).type() == std::filesystem::file_type::not_found) {
+        return saveRules({});
+    }
+    return std::filesystem::exists(rulesFile(), error)
+               ? 0
+               : fail(ErrorNumber::store, "The file " + rulesFile().string() + " cannot be reached.");
 }
 
 } // namespace velt

@@ -36,14 +36,17 @@ std::string formatRule(const ChrootRule& rule);
 /// Reads what formatRule makes; nothing when the line is something else.
 std::optional<ChrootRule> parseRule(std::string_view line);
 
+/// Reads the text of the rules file. Nothing, with the last error naming the file and the line, when it is
+/// damaged.
+std::optional<std::vector<ChrootRule>> parseRules(std::string_view text);
+
 /// The stored rules in stored order; none when nothing was stored yet. Nothing, with the last error naming
 /// the file and the line, when it cannot be read or is damaged.
 std::optional<std::vector<ChrootRule>> loadRules();
 
-/// Stores these rules in place of the stored ones; logins from now on follow them, and find the folders of
-/// the shares where they are now. Whoever changes what loadRules() returned holds a StateLock from before
-/// that call until after this one. Negative on failure, with the last error set and the stored rules as they
-/// were.
+/// Stores these rules in place of the stored ones; logins from now on follow them. Whoever changes what
+/// loadRules() returned holds a StateLock from before that call until after this one. Negative on failure,
+/// with the last error set and the stored rules as they were.
 int saveRules(const std::vector<ChrootRule>& rules);
 
 /// Stores an empty set where nothing was stored yet: without the file the FTP daemon refuses each login.

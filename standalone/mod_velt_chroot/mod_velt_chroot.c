@@ -1,238 +1,176 @@
-/* Confines each login of a local user by the chroot rules: a user's rule before a group's before the general
- * DefaultRoot. The rules are read at every login, so a change of theirs needs no restart.
+/* Gives each login the root directory that is made for it.
  *
- * A login whose rule cannot be told (rules file missing or damaged, share or folder gone) gets a root
- * directory that cannot exist: the password is still checked and counted as any other, and then the
- * login fails. Nothing is ever left to a weaker setting.
+ * As soon as a password is right, the session gets a mount namespace of its own, in which a program of ours
+ * (VeltLoginRoot) makes one folder show what the login may see. That folder is the DefaultRoot, and the
+ * directory of <Anonymous>, in the configuration. It is empty for everybody else, so that a session which
+ * were led there without us would see nothing. Where the program refuses a login, the password counts as
+ * wrong.
  */
 #include "conf.h"
 #include "privs.h"
 
-#include "standalone/mod_velt_chroot/rules.h"
+#include "standalone/mod_velt_chroot/helper.h"
 
-#include <sys/stat.h>
+#include <sched.h>
 
-#define MODULE_VERSION "mod_velt_chroot/1.0"
+#define MODULE_VERSION "mod_velt_chroot/2.0"
 
 module velt_chroot_module;
 
-/* Below a file nothing can be a directory. */
-static const char no_root[] = "/dev/null/refused";
+/* Far more than a login takes, and less than clients wait. */
+static const int longest_run = 20;
 
-/* The DefaultRoot of the configuration. A failed login may be followed by another user's, so it is put back
- * each time. */
-static const char* general_root = NULL;
+/* For whom this session's view was made; a login that fails later may be followed by another user's. */
+static const char* made_for = NULL;
 
-struct account {
-    uid_t uid;
-    gid_t gid;
-    const array_header* gids; /* NULL: no further groups */
-};
-
-static int belongs_to(unsigned long gid, const struct account* account) {
-    if (gid == (unsigned long)account->gid) {
-        return TRUE;
-    }
-    if (account->gids == NULL) {
-        return FALSE;
-    }
-    for (int i = 0; i < (int)account->gids->nelts; i++) {
-        if (gid == (unsigned long)((const gid_t*)account->gids->elts)[i]) {
-            return TRUE;
-        }
-    }
-    return FALSE;
-}
-
-static int get_account(pool* p, const char* login, struct account* account) {
+/* "1000,1000,27": the primary group, then all that the daemon knows of. NULL when they cannot be told. */
+static char* groups_text(pool* p, const struct passwd* pw) {
     array_header* gids = NULL;
     array_header* names = NULL;
 
-    const struct passwd* pw = pr_auth_getpwnam(p, login);
-    if (pw == NULL) {
+    /* Every source tells the primary group at least; without an answer, rules and refusals of groups would
+     * be skipped. */
+    char* text = pstrcat(p, pr_gid2str(p, pw->pw_gid), NULL);
+    if (pr_auth_getgroups(p, pw->pw_name, &gids, &names) < 0) {
+        return NULL;
+    }
+    for (int i = 0; gids != NULL && i < (int)gids->nelts; i++) {
+        text = pstrcat(p, text, ",", pr_gid2str(p, ((const gid_t*)gids->elts)[i]), NULL);
+    }
+    return text;
+}
+
+/* The look-ups that follow may reuse what the daemon's answer points to. */
+static struct passwd* copy_account(pool* p, const char* user) {
+    const struct passwd* known = user != NULL ? pr_auth_getpwnam(p, user) : NULL;
+    if (known == NULL || known->pw_name == NULL || known->pw_dir == NULL) {
+        return NULL;
+    }
+    struct passwd* copy = pcalloc(p, sizeof(struct passwd));
+    copy->pw_name = pstrdup(p, known->pw_name);
+    copy->pw_dir = pstrdup(p, known->pw_dir);
+    copy->pw_uid = known->pw_uid;
+    copy->pw_gid = known->pw_gid;
+    return copy;
+}
+
+static int run_program(pool* p, const config_rec* c, const char* kind, const char* root, const char* user) {
+    char words[1024] = "the account cannot be told";
+    int good = FALSE;
+
+    struct passwd* pw = copy_account(p, user);
+    char* groups = pw != NULL ? groups_text(p, pw) : NULL;
+    if (groups != NULL) {
+        char* arguments[] = {c->argv[0],
+                             c->argv[1],
+                             pstrdup(p, kind),
+                             pstrdup(p, root),
+                             pw->pw_name,
+                             pstrdup(p, pr_uid2str(p, pw->pw_uid)),
+                             groups,
+                             pw->pw_dir,
+                             c->argc > 3 && session.anon_config != NULL ? c->argv[3] : NULL,
+                             NULL};
+        /* Only where everything may be seen there is nothing to be made. */
+        int isolated = strcmp(kind, "server") != 0;
+        PRIVS_ROOT
+        if (isolated && strcmp(root, "/") == 0) {
+            (void)snprintf(words, sizeof(words), "no DefaultRoot to be made");
+        } else if (isolated && unshare(CLONE_NEWNS) < 0) {
+            (void)snprintf(words, sizeof(words), "no mount namespace: %s", strerror(errno));
+        } else {
+            good = velt_helper_run(arguments, longest_run, words, sizeof(words));
+        }
+        PRIVS_RELINQUISH
+    }
+    if (!good) {
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login of '%s' refused: %s", user, words);
+    } else if (words[0] != '\0') {
+        pr_log_pri(PR_LOG_WARNING, MODULE_VERSION ": login of '%s': %s", user, words);
+    }
+    return good;
+}
+
+/* Makes `root` show what the user who logs in may see. */
+static int make_view(const char* root, int anonymous) {
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "VeltLoginRoot", FALSE);
+    const char* user = session.user;
+
+    made_for = NULL;
+    if (c == NULL || user == NULL) {
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login refused: no VeltLoginRoot");
         return FALSE;
     }
-    /* The next look-up may reuse what `pw` points to. */
-    account->uid = pw->pw_uid;
-    account->gid = pw->pw_gid;
-    /* Every source tells the primary group at least; without an answer, group rules would be skipped. */
-    if (pr_auth_getgroups(p, pstrdup(p, pw->pw_name), &gids, &names) < 0) {
-        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": the groups cannot be told: login of '%s' refused", login);
-        return FALSE;
+    pool* p = make_sub_pool(session.pool);
+    int good = run_program(p, c, anonymous ? "anonymous" : c->argv[2], root, user);
+    destroy_pool(p);
+    if (good) {
+        made_for = pstrdup(session.pool, user);
     }
-    account->gids = gids;
-    return TRUE;
+    return good;
 }
 
-/* Finds the path of the rule that applies: NULL when none does. FALSE when the rules cannot be read to their
- * end. */
-static int find_rule(pool* p, const char* file, const struct account* account, const char** path) {
-    struct velt_lines lines;
-    struct velt_rule rule;
-    int status = 0;
+/* A local user's password has been checked. */
+static void on_authenticated(const void* data, void* ignored) {
+    /* The daemon goes by what stands here when all listeners have been told. */
+    int* code = (int*)data;
+    (void)ignored;
 
-    *path = NULL;
-    if (velt_lines_open(&lines, file, VELT_RULES_HEADER) < 0) {
-        return FALSE;
+    if (code == NULL || *code < 0 || session.anon_config != NULL) {
+        return;
     }
-    int have_user_rule = FALSE;
-    while ((status = velt_lines_next(&lines)) > 0) {
-        if (velt_rule_parse(lines.text, &rule) < 0) {
-            status = -1;
-            break;
-        }
-        if (rule.is_user && !have_user_rule && rule.id == (unsigned long)account->uid) {
-            *path = pstrdup(p, rule.path);
-            have_user_rule = TRUE;
-        } else if (!rule.is_user && *path == NULL && belongs_to(rule.id, account)) {
-            *path = pstrdup(p, rule.path);
-        }
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
+    if (!make_view(c != NULL ? c->argv[0] : "/", FALSE)) {
+        *code = PR_AUTH_DISABLEDPWD;
     }
-    velt_lines_close(&lines);
-    return status == 0;
 }
 
-/* The folder of the share `name`; NULL when the map does not tell. */
-static const char* share_folder(pool* p, const char* map, const char* name, size_t name_length) {
-    struct velt_lines lines;
-    const char* folder = NULL;
+/* The session is about to enter its root directory. */
+static void on_chroot(const void* root, void* ignored) {
+    int good = FALSE;
+    (void)ignored;
 
-    if (velt_lines_open(&lines, map, VELT_SHARES_HEADER) < 0) {
-        return NULL;
+    if (session.anon_config != NULL) {
+        good = make_view(root, TRUE);
+    } else {
+        good = made_for != NULL && session.user != NULL && strcmp(made_for, session.user) == 0;
     }
-    while (folder == NULL && velt_lines_next(&lines) > 0) {
-        const char* tab = strchr(lines.text, '\t');
-        if (tab != NULL && (size_t)(tab - lines.text) == name_length &&
-            memcmp(lines.text, name, name_length) == 0) {
-            folder = pstrdup(p, tab + 1);
-        }
+    if (!good) {
+        pr_response_send(R_530, "Login incorrect.");
+        pr_session_end(0);
     }
-    velt_lines_close(&lines);
-    return folder;
 }
 
-static int is_below(const char* folder, const char* path) {
-    size_t length = strlen(folder);
-
-    if (strcmp(folder, "/") == 0) {
-        return TRUE;
+/* usage: VeltLoginRoot program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
+MODRET set_velt_login_root(cmd_rec* cmd) {
+    if (cmd->argc < 4 || cmd->argc > 5) {
+        CONF_ERROR(cmd, "wrong number of parameters");
     }
-    return strncmp(folder, path, length) == 0 && (path[length] == '\0' || path[length] == '/');
-}
-
-/* The root directory for a rule's path; NULL when there is none. Whoever may write in the share could put a
- * symbolic link in the place of a folder, so the folder must still lie in the share when all links are
- * followed. */
-static const char* root_of_rule(pool* p, const char* map, const char* rule_path) {
-    char share_real[PATH_MAX];
-    char real[PATH_MAX];
-    struct stat st;
-
-    if (strcmp(rule_path, "/home") == 0) {
-        return "~";
-    }
-    const char* name = rule_path + 1;
-    size_t name_length = strcspn(name, "/");
-    const char* folder = share_folder(p, map, name, name_length);
-    if (folder == NULL || realpath(folder, share_real) == NULL) {
-        return NULL;
-    }
-    const char* whole = pstrcat(p, share_real, name + name_length, NULL);
-    if (realpath(whole, real) == NULL || !is_below(share_real, real) || stat(real, &st) < 0 ||
-        !S_ISDIR(st.st_mode)) {
-        return NULL;
-    }
-    /* The daemon would put the user's name in its place. */
-    if (strstr(real, "%u") != NULL) {
-        return NULL;
-    }
-    return pstrdup(p, real);
-}
-
-static const char* root_of_login(pool* p, const config_rec* places, const char* login) {
-    const char* rule_path = NULL;
-    const char* root = NULL;
-
-    struct account account;
-    if (!get_account(p, login, &account)) {
-        return no_root;
-    }
-
-    PRIVS_ROOT
-    int readable = find_rule(p, places->argv[0], &account, &rule_path);
-    if (readable && rule_path != NULL) {
-        root = root_of_rule(p, places->argv[1], rule_path);
-    }
-    PRIVS_RELINQUISH
-
-    if (!readable) {
-        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": the chroot rules cannot be read: login of '%s' refused",
-                   login);
-        return no_root;
-    }
-    if (rule_path == NULL) {
-        return general_root;
-    }
-    if (root == NULL) {
-        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": there is no folder '%s': login of '%s' refused", rule_path,
-                   login);
-        return no_root;
-    }
-    return root;
-}
-
-MODRET velt_pre_pass(cmd_rec* cmd) {
-    const char* login = pr_table_get(session.notes, "mod_auth.orig-user", NULL);
-    if (login == NULL || pr_auth_get_anon_config(cmd->tmp_pool, &login, NULL, NULL) != NULL) {
-        return PR_DECLINED(cmd);
-    }
-
-    const config_rec* places = find_config(main_server->conf, CONF_PARAM, "VeltChrootRules", FALSE);
-    const char* root = no_root;
-    if (places != NULL && login != NULL) {
-        root = root_of_login(cmd->tmp_pool, places, login);
-    }
-
-    (void)remove_config(main_server->conf, "DefaultRoot", FALSE);
-    if (root != NULL) {
-        config_rec* c = add_config_param_set(&main_server->conf, "DefaultRoot", 1, NULL);
-        c->argv[0] = pstrdup(c->pool, root);
-    }
-    return PR_DECLINED(cmd);
-}
-
-/* usage: VeltChrootRules rules-file share-map */
-MODRET set_velt_chroot_rules(cmd_rec* cmd) {
-    CHECK_ARGS(cmd, 2);
     CHECK_CONF(cmd, CONF_ROOT);
-    for (int i = 1; i <= 2; i++) {
-        if (*(const char*)cmd->argv[i] != '/') {
-            CONF_ERROR(cmd, "needs two absolute paths");
-        }
+    if (*(const char*)cmd->argv[1] != '/' || *(const char*)cmd->argv[2] != '/') {
+        CONF_ERROR(cmd, "needs absolute paths");
     }
-    (void)add_config_param_str(cmd->argv[0], 2, cmd->argv[1], cmd->argv[2]);
+    if (cmd->argc == 5) {
+        (void)add_config_param_str(cmd->argv[0], 4, cmd->argv[1], cmd->argv[2], cmd->argv[3], cmd->argv[4]);
+    } else {
+        (void)add_config_param_str(cmd->argv[0], 3, cmd->argv[1], cmd->argv[2], cmd->argv[3]);
+    }
     return PR_HANDLED(cmd);
 }
 
 static int velt_sess_init(void) {
-    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
-    if (c != NULL) {
-        general_root = pstrdup(session.pool, c->argv[0]);
+    if (pr_event_register(&velt_chroot_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
+        pr_event_register(&velt_chroot_module, "core.chroot", on_chroot, NULL) < 0) {
+        return -1;
     }
     return 0;
 }
 
 static conftable velt_conftab[] = {
-    {"VeltChrootRules", set_velt_chroot_rules, NULL},
+    {"VeltLoginRoot", set_velt_login_root, NULL},
     {NULL, NULL, NULL},
 };
 
-static cmdtable velt_cmdtab[] = {
-    {PRE_CMD, C_PASS, G_NONE, velt_pre_pass, FALSE, FALSE, CL_AUTH, NULL},
-    {0, NULL, NULL, NULL, FALSE, FALSE, 0, NULL},
-};
-
 module velt_chroot_module = {
-    NULL, NULL, 0x20,           "velt_chroot",  velt_conftab, velt_cmdtab,
-    NULL, NULL, velt_sess_init, MODULE_VERSION, NULL,         0,
+    NULL, NULL, 0x20, "velt_chroot", velt_conftab, NULL, NULL, NULL, velt_sess_init, MODULE_VERSION, NULL, 0,
 };

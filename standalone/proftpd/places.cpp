@@ -5,16 +5,13 @@
 #include "standalone/core/state_root.h"
 #include "standalone/core/unique_fd.h"
 #include "standalone/installed_files.h"
-#include "standalone/proftpd/share_lists.h"
 #include "standalone/settings/network_settings.h"
-#include "standalone/shares/share_privilege.h"
+#include "standalone/shares/share_store.h"
 #include "standalone/tls/certificate.h"
 
 #include <netinet/in.h>
 #include <sys/socket.h>
 #include <unistd.h>
-
-#include <algorithm>
 
 namespace velt {
 namespace {
@@ -26,19 +23,6 @@ bool hasIPv6() {
     sockaddr_in6 any{};
     any.sin6_family = AF_INET6;
     return socket && bind(socket.get(), reinterpret_cast<const sockaddr*>(&any), sizeof any) == 0;
-}
-
-AnonymousAccess accessOfAnonymous(const ShareEntry& share) {
-    switch (privilegeOn(share, anonymousAccount).value_or(SharePrivilege::none)) {
-    case SharePrivilege::readWrite:
-        return AnonymousAccess::write;
-    case SharePrivilege::readOnly:
-        return AnonymousAccess::read;
-    case SharePrivilege::none:
-    case SharePrivilege::denied:
-        break;
-    }
-    return AnonymousAccess::none;
 }
 
 // The daemon would grant the login all the same, under an account of its own choice.
@@ -53,34 +37,10 @@ int checkAnonymousAccount() {
     return 0;
 }
 
-int surveyShares(const FtpSettings& settings, FtpSurroundings& found) {
+// Logins follow the shares that are stored then. That these cannot be read is better said at once.
+int surveyShares(const FtpSettings& settings) {
     const auto& record = settings.record;
-    const bool confined = record.anonymous != 0 && record.anonymous_chroot != 0;
-    const bool mounted = needsShareRoot(settings) && !found.places.accountFiles;
-    if (!confined && !mounted) {
-        return 0;
-    }
-    const auto shares = allShares();
-    if (!shares) {
-        return -1;
-    }
-    if (confined) {
-        const auto share =
-            std::ranges::find(*shares, std::string(record.anonymous_chroot_share), &ShareEntry::name);
-        const auto access = share != shares->end() ? accessOfAnonymous(*share) : AnonymousAccess::none;
-        // A share that went away since it was chosen closes anonymous FTP, not the whole service.
-        if (access != AnonymousAccess::none) {
-            found.anonymousFolder = share->path;
-            found.places.anonymousMayWrite = access == AnonymousAccess::write;
-        }
-    }
-    if (mounted) {
-        const bool everywhere = record.anonymous != 0 && !confined;
-        found.mounts = mountListText(*shares, [&](const ShareEntry& share) {
-            return everywhere ? accessOfAnonymous(share) : AnonymousAccess::none;
-        });
-    }
-    return 0;
+    return (record.anonymous == 0 && record.user_chroot != 0) || allShares() ? 0 : -1;
 }
 
 int surveyCertificate(FtpSurroundings& found) {
@@ -125,13 +85,13 @@ std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
     auto& places = found.places;
     places.moduleFolder = installedFile("mod_velt_chroot.so").parent_path();
     places.runFolder = ftpRunFolder();
-    places.chrootRules = statePath("/etc/velt/chroot_rules");
-    places.shareMap = ftpRunFolder() / "shares.map";
-    places.shareRoot = ftpRunFolder() / "shares";
+    places.loginProgram = installedFile("velt-share-root");
+    places.stateRoot = statePath("/");
+    places.loginRoot = ftpRunFolder() / "root";
     // As long as the place in the plan's own folder, whose name is known only when all of this is.
-    places.anonymousLink = ftpRunFolder() / "configurations" / std::string(64, '0') / "anonymous";
+    places.anonymousShare = ftpRunFolder() / "configurations" / std::string(64, '0') / "anonymous";
     places.ipv6 = hasIPv6();
-    if (!isRenderable(places.anonymousLink) || !isRenderable(places.moduleFolder)) {
+    if (!isRenderable(places.anonymousShare) || !isRenderable(places.loginProgram)) {
         fail(ErrorNumber::invalid, "The folder " + statePath("/").string() + " or " +
                                        places.moduleFolder.string() +
                                        " has a name that the FTP daemon's configuration cannot hold.");
@@ -144,7 +104,7 @@ std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
     }
     places.loopbackOnly = network->loopbackOnly;
     if (surveyRights(places) < 0 || (settings.record.anonymous != 0 && checkAnonymousAccount() < 0) ||
-        surveyShares(settings, found) < 0 || (tls && surveyCertificate(found) < 0)) {
+        surveyShares(settings) < 0 || (tls && surveyCertificate(found) < 0)) {
         return std::nullopt;
     }
     return found;

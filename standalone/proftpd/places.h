@@ -17,14 +17,11 @@ class ScratchFolder;
 std::filesystem::path ftpRunFolder();
 
 /// What goes into the configuration beside the settings, found out anew: places, certificate (made when it is
-/// missing and needed), the rights of this process, what anonymous users may do.
+/// missing and needed), the rights of this process.
 struct FtpSurroundings {
     ProftpdPlaces places;
-    std::string certificateFingerprint; ///< "" where FTPS is off
-    std::filesystem::path
-        anonymousFolder; ///< of the share that confines anonymous users; "": none or out of reach
+    std::string certificateFingerprint;             ///< "" where FTPS is off
     std::shared_ptr<const ScratchFolder> throwAway; ///< keeps a certificate that is for a test only
-    std::string mounts; ///< the list for velt-share-root; "" where it is not needed
 };
 
 /// Nothing, with the last error set, when the surroundings do not allow these settings: no account "ftp" for

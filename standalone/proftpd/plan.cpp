@@ -4,9 +4,8 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/daemon_test.h"
-#include "standalone/installed_files.h"
 #include "standalone/proftpd/places.h"
-#include "standalone/proftpd/share_lists.h"
+#include "standalone/proftpd/session_mounts.h"
 #include "standalone/settings/candidate.h"
 #include "standalone/tls/digest.h"
 
@@ -41,58 +40,42 @@ int makeFolder(const std::filesystem::path& path) {
                  : 0;
 }
 
-int replaceLink(const std::filesystem::path& link, const std::filesystem::path& target) {
-    std::error_code error;
-    const auto next = std::filesystem::path(link.string() + ".new");
-    std::filesystem::remove(next, error);
-    if (target.empty()) {
-        std::filesystem::remove(link, error);
-    } else if (std::filesystem::create_symlink(target, next, error); !error) {
-        std::filesystem::rename(next, link, error);
-    }
-    return error ? fail(ErrorNumber::store,
-                        "The link " + link.string() + " cannot be made: " + error.message() + ".")
-                 : 0;
+bool confinesAnonymous(const FtpSettings& settings) {
+    return settings.record.anonymous != 0 && settings.record.anonymous_chroot != 0;
 }
 
 /// Stands for all that a daemon reads at its start and nowhere else.
 std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
     std::string all = renderProftpd(settings, found.places);
-    for (const std::string& part :
-         {found.anonymousFolder.string(), found.mounts, found.certificateFingerprint,
-          installedFile("velt-share-root").string()}) {
+    const std::string share = confinesAnonymous(settings) ? settings.record.anonymous_chroot_share : "";
+    for (const std::string& part : {share, found.certificateFingerprint}) {
         all += '\0' + part;
     }
     return sha256(all);
 }
 
-int writeSurroundings(const FtpSurroundings& found) {
-    const auto& places = found.places;
-    if (makeFolder(places.runFolder) < 0 || makeFolder(places.shareRoot) < 0 ||
-        makeFolder(places.anonymousLink.parent_path()) < 0 ||
-        replaceLink(places.anonymousLink, found.anonymousFolder) < 0 || makeRulesFile() < 0) {
+int writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
+    if (makeFolder(places.runFolder) < 0 || makeFolder(places.loginRoot) < 0 ||
+        makeFolder(places.anonymousShare.parent_path()) < 0 || makeRulesFile() < 0) {
         return -1;
     }
-    return refreshShareMap();
+    return confinesAnonymous(settings)
+               ? replaceFile(places.anonymousShare, settings.record.anonymous_chroot_share, 0600)
+               : 0;
 }
 
 std::optional<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found) {
     DaemonPlan plan;
     plan.configurationHash = hashOf(settings, found);
     plan.folder = found.places.runFolder / "configurations" / plan.configurationHash;
-    found.places.anonymousLink = plan.folder / "anonymous";
+    found.places.anonymousShare = plan.folder / "anonymous";
     const auto configuration = plan.folder / "proftpd.conf";
-    const auto mountList = plan.folder / "mounts";
-    if (writeSurroundings(found) < 0 ||
-        replaceFile(configuration, renderProftpd(settings, found.places), 0600) < 0 ||
-        replaceFile(mountList, found.mounts, 0600) < 0) {
+    if (writeSurroundings(settings, found.places) < 0 ||
+        replaceFile(configuration, renderProftpd(settings, found.places), 0600) < 0) {
         return std::nullopt;
     }
-    if (needsShareRoot(settings) && !found.places.accountFiles) {
-        plan.arguments = {installedFile("velt-share-root"), mountList, found.places.shareRoot};
-    }
     // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
-    plan.arguments.insert(plan.arguments.end(), {program, "-n", "-c", configuration.string()});
+    plan.arguments = {program, "-n", "-c", configuration.string()};
     plan.executable = program;
     plan.listenPorts = {controlPort(settings.record)};
     return plan;
@@ -119,12 +102,11 @@ std::optional<DaemonPlan> planFtpDaemon() {
     if (!found || testRendering(*settings, found->places) < 0) {
         return std::nullopt;
     }
+    // Else the daemon would start well, and refuse every login.
+    if (!found->places.accountFiles && checkSessionMounts() < 0) {
+        return std::nullopt;
+    }
     return writePlan(*settings, *found);
-}
-
-int refreshShareMap() {
-    const auto shares = allShares();
-    return shares ? replaceFile(ftpRunFolder() / "shares.map", shareMapText(*shares), 0644) : -1;
 }
 
 } // namespace velt

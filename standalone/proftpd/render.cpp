@@ -165,6 +165,23 @@ void renderFiles(Text& text, const FtpSettings& settings) {
     text.line("Umask", settings.umask ? "022 022" : "000 000");
 }
 
+void renderLoginRoot(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
+    const auto& record = settings.record;
+    const char* others = places.accountFiles ? "server" : "shares";
+    const char* kind = record.user_chroot != 0 ? "home" : others;
+    if (record.anonymous != 0 && record.anonymous_chroot != 0) {
+        text.line("VeltLoginRoot", places.loginProgram, places.stateRoot, kind, places.anonymousShare);
+    } else {
+        text.line("VeltLoginRoot", places.loginProgram, places.stateRoot, kind);
+    }
+    // A daemon without root's rights cannot change the root directory: where it must, it refuses the login.
+    if (!places.accountFiles || record.user_chroot != 0) {
+        text.line("DefaultRoot", places.loginRoot);
+        // The home's path means nothing below another root.
+        text.line("DefaultChdir /");
+    }
+}
+
 void renderLogin(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
     if (places.accountFiles) {
         text.line("AuthPAM off");
@@ -178,31 +195,18 @@ void renderLogin(Text& text, const FtpSettings& settings, const ProftpdPlaces& p
     }
     text.line("RequireValidShell off");
     text.line("PersistentPasswd off");
-    text.line("VeltChrootRules", places.chrootRules, places.shareMap);
-    if (settings.record.user_chroot != 0) {
-        text.line("DefaultRoot ~");
-    } else if (!places.accountFiles) {
-        text.line("DefaultRoot", places.shareRoot / "users");
-    }
+    renderLoginRoot(text, settings, places);
 }
 
 void renderAnonymous(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
-    const auto& record = settings.record;
-    if (record.anonymous == 0) {
+    if (settings.record.anonymous == 0) {
         return;
     }
-    const bool confined = record.anonymous_chroot != 0;
-    text.line("<Anonymous", confined ? places.anonymousLink : places.shareRoot / "anonymous", ">");
+    text.line("<Anonymous", places.loginRoot, ">");
     text.line("  User ftp");
     text.line("  Group nogroup");
     text.line("  UserAlias anonymous ftp");
     text.line("  RequireValidShell off");
-    // Under the share root each share is mounted for reading only where that is what is granted.
-    if (confined && !places.anonymousMayWrite) {
-        text.line("  <Limit WRITE>");
-        text.line("    DenyAll");
-        text.line("  </Limit>");
-    }
     text.line("</Anonymous>");
 }
 
@@ -228,11 +232,6 @@ std::string renderProftpd(const FtpSettings& settings, const ProftpdPlaces& plac
     renderLogin(text, settings, places);
     renderAnonymous(text, settings, places);
     return text.take();
-}
-
-bool needsShareRoot(const FtpSettings& settings) {
-    const auto& record = settings.record;
-    return record.user_chroot == 0 || (record.anonymous != 0 && record.anonymous_chroot == 0);
 }
 
 } // namespace velt

@@ -21,18 +21,17 @@ struct AccountFiles {
 struct ProftpdPlaces {
     std::filesystem::path moduleFolder; ///< holds mod_velt_chroot.so
     std::filesystem::path runFolder;    ///< for the daemon's own run-time files
-    std::filesystem::path chrootRules;
-    std::filesystem::path shareMap;
-    std::filesystem::path shareRoot;     ///< holds "users" and "anonymous", in the daemon's own name space
-    std::filesystem::path anonymousLink; ///< leads to the share that anonymous users are confined to
-    std::filesystem::path certificate;   ///< needed where FTPS is on
+    std::filesystem::path loginProgram; ///< velt-share-root
+    std::filesystem::path stateRoot;
+    std::filesystem::path loginRoot; ///< an empty folder, on which the program shows what a login may see
+    std::filesystem::path anonymousShare; ///< a file: names the share that anonymous users are confined to
+    std::filesystem::path certificate;    ///< needed where FTPS is on
     std::filesystem::path certificateKey;
     bool certificateIsRsa = false; ///< else it is an elliptic curve's
     std::string user = "proftpd";
     std::string group = "nogroup";
     bool ipv6 = true;
-    bool loopbackOnly = false; ///< clients of this machine only, over IPv4
-    bool anonymousMayWrite = false;
+    bool loopbackOnly = false;                ///< clients of this machine only, over IPv4
     std::optional<AccountFiles> accountFiles; ///< absent: the server's users, through PAM
 };
 
@@ -43,10 +42,6 @@ bool isRenderable(const std::filesystem::path& path);
 /// The whole configuration. The settings have passed checkFtpSettings, the places isRenderable. A pure
 /// function.
 std::string renderProftpd(const FtpSettings& settings, const ProftpdPlaces& places);
-
-/// Whether local users without a rule see the shares under one root instead of their homes, or anonymous
-/// users do: the daemon then needs the share root.
-bool needsShareRoot(const FtpSettings& settings);
 
 } // namespace velt
 

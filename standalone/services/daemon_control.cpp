@@ -82,12 +82,22 @@ NextStart nextStart(Daemon daemon, const ServiceState& now) {
 }
 
 /// After a start or a stop with this result: the rules open the ports of what is enabled, which may have
-/// changed although no port did. A daemon that did what was asked of it has not failed because of them.
+/// changed although no port did.
 int followedByFirewall(int result) {
-    if (result >= 0 && VELTFwRuleHup() < 0) {
-        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    if (result >= 0) {
+        followWithFirewall();
     }
     return result;
+}
+
+/// Nothing, with the last error set, when the settings cannot be read.
+std::optional<bool> isEnabled(Daemon daemon) {
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        return settings ? std::optional(enablesFtp(settings->record)) : std::nullopt;
+    }
+    const auto settings = loadSftpSettings();
+    return settings ? std::optional(settings->enabled) : std::nullopt;
 }
 
 int startPlanned(Daemon daemon) {
@@ -110,6 +120,13 @@ int startPlanned(Daemon daemon) {
 }
 
 } // namespace
+
+void followWithFirewall() {
+    const LastErrorKept kept;
+    if (VELTFwRuleHup() < 0) {
+        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    }
+}
 
 std::string daemonName(Daemon daemon) {
     return daemon == Daemon::ftp ? "ftpd" : "sftp";
@@ -158,6 +175,30 @@ int stopDaemonForRestart(Daemon daemon) {
 int pauseDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
     return lock ? makeServiceBackend(daemonName(daemon))->pause() : -1;
+}
+
+bool lostItsSupervisor(const ServiceState& state) {
+    const bool wasAtWork = state.state == RunState::running || state.state == RunState::failed;
+    return wasAtWork && state.supervisor && !isAlive(state.supervisor);
+}
+
+int restoreDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    // Somebody may have taken it in hand while the lock was waited for.
+    const ServiceState now = daemonState(daemon);
+    if (isServing(now) && !lostItsSupervisor(now)) {
+        return 0;
+    }
+    const auto enabled = isEnabled(daemon);
+    if (!enabled) {
+        return -1;
+    }
+    const std::string name = daemonName(daemon);
+    return followedByFirewall(
+        noteOutcome(name, *enabled ? startPlanned(daemon) : makeServiceBackend(name)->stop()));
 }
 
 ServiceState daemonState(Daemon daemon) {

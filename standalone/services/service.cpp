@@ -1,6 +1,5 @@
 #include "platform/service.h"
 
-#include "platform/firewall.h"
 #include "platform/sftp.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
@@ -61,11 +60,7 @@ int startOrStop(const char* service, bool wanted) {
 
 int startEnabledServices() {
     return atBoundary([] {
-        // The firewall's rules went with the boot as well. Rules that miss do not keep the services down,
-        // just as they do not when a port changes.
-        if (VELTFwRuleHup() < 0) {
-            ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
-        }
+        followWithFirewall(); // its rules went with the boot as well
         const auto ftp = loadFtpSettings();
         const int ftpResult = ftp ? startOrStop("ftpd", enablesFtp(ftp->record)) : -1;
         if (ftpResult < 0) {

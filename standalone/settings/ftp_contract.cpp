@@ -7,6 +7,7 @@
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/settings/record_merge.h"
 #include "standalone/settings/settings_files.h"
 #include "standalone/settings/settings_store.h"
 
@@ -24,6 +25,31 @@ template<class Value> int readSetting(Value FtpSettings::*setting) {
 template<class Value> int writeSetting(Value FtpSettings::*setting, Value value) {
     return atBoundary(
         [&] { return changeFtpSettings([&](FtpSettings& settings) { settings.*setting = value; }); });
+}
+
+LastSeen<_tag_VELT_FTP_CONF_>& lastSeenRecord() {
+    thread_local LastSeen<_tag_VELT_FTP_CONF_> seen;
+    return seen;
+}
+
+int readRecord(_tag_VELT_FTP_CONF_& record) {
+    lastSeenRecord().forget();
+    const auto settings = loadFtpFile();
+    if (!settings)
+        return -1;
+    record = settings->record;
+    lastSeenRecord().note(record);
+    return 0;
+}
+
+int storeRecord(const _tag_VELT_FTP_CONF_& record) {
+    const int result = changeFtpSettings([&record](FtpSettings& settings) {
+        settings.record = lastSeenRecord().merge(settings.record, record);
+    });
+    // Not what was stored in the end: the caller goes on with its own copy.
+    if (result >= 0)
+        lastSeenRecord().note(record);
+    return result;
 }
 
 int noPlaceFor(const char* what) {
@@ -49,17 +75,11 @@ int writeSystemInformation(std::string_view key, std::string_view value) {
 int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out) {
     if (out == nullptr)
         return velt::noPlaceFor("the FTP settings");
-    return velt::atBoundary([&] {
-        const auto settings = velt::loadFtpFile();
-        if (!settings)
-            return -1;
-        *out = settings->record;
-        return 0;
-    });
+    return velt::atBoundary([out] { return velt::readRecord(*out); });
 }
 
 int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf) {
-    return velt::writeSetting(&velt::FtpSettings::record, conf);
+    return velt::atBoundary([&conf] { return velt::storeRecord(conf); });
 }
 
 int VELTFTPTimeOutGet(void) {

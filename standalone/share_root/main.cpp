@@ -1,142 +1,119 @@
-// velt-share-root LIST FOLDER PROGRAM ARGUMENTS...
+// velt-share-root STATE KIND ROOT USER UID GIDS HOME [FILE]
 //
-// Gives a daemon a mount namespace of its own in which the shares stand side by side below FOLDER, as LIST
-// says, and becomes that daemon. The server's own mount table stays as it is, and everything is gone when the
-// daemon has ended.
+// Makes the folder ROOT show what a login of the FTP daemon may see, in the mount namespace of the session
+// that started this program, and ends: with 0 when the session may go on with ROOT as its root directory,
+// else with why not on standard error. Nobody else sees anything of it, and it is gone when the session has
+// ended.
 //
-// LIST has one line per share: "ro" or "rw", the place below FOLDER, and the share's folder, separated by
-// tabs.
-#include <fcntl.h>
-#include <sys/mount.h>
+// STATE is the state root; KIND is "home", "shares", "anonymous" or "server", as in login.h; GIDS are the
+// numbers of the user's groups, the primary one first, separated by commas; FILE names the share of
+// anonymous users.
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/share_root/login_root.h"
+#include "standalone/text/plain_text.h"
+
+#include <grp.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <cerrno>
-#include <climits>
+#include <array>
+#include <charconv>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
-#include <filesystem>
-#include <fstream>
-#include <sched.h>
-#include <string>
+#include <exception>
+#include <optional>
+#include <string_view>
+#include <utility>
 
 namespace {
 
-[[noreturn]] void giveUp(const std::string& what) {
-    std::fprintf(stderr, "velt-share-root: %s: %s\n", what.c_str(), std::strerror(errno));
-    std::exit(EXIT_FAILURE);
-}
-
-void leaveOut(const std::string& what, int error) {
-    std::fprintf(stderr, "velt-share-root: %s: %s; the share is left out\n", what.c_str(),
-                 std::strerror(error));
-}
-
-struct Place {
-    bool readOnly = false;
-    std::string name;
-    std::string folder;
+constexpr std::array kinds{
+    std::pair{"home", velt::LoginKind::home},
+    std::pair{"shares", velt::LoginKind::shares},
+    std::pair{"anonymous", velt::LoginKind::anonymous},
+    std::pair{"server", velt::LoginKind::server},
 };
 
-bool leadsUp(const std::string& path) {
-    return ("/" + path + "/").find("/../") != std::string::npos;
+std::optional<unsigned> numberOf(std::string_view text) {
+    unsigned number = 0;
+    const auto [rest, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    // The greatest number means "no one" to the kernel.
+    const bool whole = error == std::errc() && rest == text.data() + text.size();
+    return whole && number != static_cast<unsigned>(-1) ? std::optional(number) : std::nullopt;
 }
 
-Place parsePlace(const std::string& line) {
-    const auto first = line.find('\t');
-    const auto second = line.find('\t', first == std::string::npos ? first : first + 1);
-    if (second == std::string::npos) {
-        errno = EINVAL;
-        giveUp("the list of shares");
-    }
-    Place place{line.substr(0, first) == "ro", line.substr(first + 1, second - first - 1),
-                line.substr(second + 1)};
-    if (leadsUp(place.name)) {
-        errno = EINVAL;
-        giveUp("the list of shares");
-    }
-    return place;
-}
-
-// Adds to what the server's own mounts are restricted by already; a plain remount would lift that.
-bool restrict(const std::string& target, bool readOnly) {
-    mount_attr attributes{};
-    attributes.attr_set = MOUNT_ATTR_NOSUID | MOUNT_ATTR_NODEV;
-    if (readOnly) {
-        attributes.attr_set |= MOUNT_ATTR_RDONLY;
-    }
-    return mount_setattr(AT_FDCWD, target.c_str(), AT_RECURSIVE, &attributes, sizeof attributes) == 0;
-}
-
-// A share that cannot be shown is left out, so that the others can still be reached.
-void mountShare(const std::string& root, const Place& place) {
-    const std::string target = root + "/" + place.name;
-    std::error_code error;
-    if (!std::filesystem::is_directory(place.folder, error)) {
-        leaveOut(place.folder, error ? error.value() : ENOTDIR);
-        return;
-    }
-    if (!std::filesystem::create_directories(target, error) && error) {
-        leaveOut(target, error.value());
-        return;
-    }
-    if (mount(place.folder.c_str(), target.c_str(), nullptr, MS_BIND | MS_REC, nullptr) < 0) {
-        const int reason = errno;
-        rmdir(target.c_str());
-        leaveOut("mount " + place.folder, reason);
-        return;
-    }
-    if (!restrict(target, place.readOnly)) {
-        const int reason = errno;
-        // It must not stay there with more rights than it should give.
-        if (umount2(target.c_str(), MNT_DETACH) < 0) {
-            giveUp("umount " + place.folder);
+bool readNumbers(std::string_view text, std::vector<gid_t>& numbers) {
+    for (;;) {
+        const auto comma = text.find(',');
+        const auto number = numberOf(text.substr(0, comma));
+        if (!number) {
+            return false;
         }
-        rmdir(target.c_str());
-        leaveOut("restrict " + place.folder, reason);
+        numbers.push_back(*number);
+        if (comma == std::string_view::npos) {
+            return true;
+        }
+        text.remove_prefix(comma + 1);
     }
 }
 
-void makeRoot(const std::string& list, const std::string& root) {
-    if (unshare(CLONE_NEWNS) < 0) {
-        giveUp("unshare");
+bool readLogin(int count, char** arguments, velt::Login& login) {
+    if (count != 8 && count != 9) {
+        return false;
     }
-    // What the server mounts later shows here, nothing of ours shows there.
-    if (mount(nullptr, "/", nullptr, MS_REC | MS_SLAVE, nullptr) < 0) {
-        giveUp("mount /");
-    }
-    if (mount("velt-shares", root.c_str(), "tmpfs", MS_NOSUID | MS_NODEV | MS_NOEXEC, "mode=0755,size=1m") <
-        0) {
-        giveUp("mount " + root);
-    }
-    std::ifstream lines(list);
-    if (!lines) {
-        giveUp(list);
-    }
-    for (const char* tree : {"/users", "/anonymous"}) {
-        if (mkdir((root + tree).c_str(), 0755) < 0) {
-            giveUp(root + tree);
+    bool known = false;
+    for (const auto& [word, kind] : kinds) {
+        if (std::string_view(arguments[2]) == word) {
+            login.kind = kind;
+            known = true;
         }
     }
-    for (std::string line; std::getline(lines, line);) {
-        mountShare(root, parsePlace(line));
+    const auto uid = numberOf(arguments[5]);
+    login.user = arguments[4];
+    login.uid = uid.value_or(0);
+    login.home = arguments[7];
+    login.anonymousShare = count == 9 ? arguments[8] : "";
+    return known && uid && readNumbers(arguments[6], login.gids);
+}
+
+// The daemon has put a user's numbers in the place of some of root's.
+bool becomeRoot() {
+    return getuid() != 0 ||
+           (setgroups(0, nullptr) == 0 && setresgid(0, 0, 0) == 0 && setresuid(0, 0, 0) == 0);
+}
+
+int refuse(std::string_view why) {
+    std::fprintf(stderr, "%s\n", velt::plainText(why, 500).c_str());
+    return EXIT_FAILURE;
+}
+
+int run(int count, char** arguments) {
+    velt::Login login;
+    if (!readLogin(count, arguments, login)) {
+        return refuse("usage: velt-share-root STATE KIND ROOT USER UID GIDS HOME [FILE]");
     }
-    if (mount(nullptr, root.c_str(), nullptr, MS_REMOUNT | MS_BIND | MS_RDONLY | MS_NOSUID | MS_NODEV,
-              nullptr) < 0) {
-        giveUp("remount " + root);
+    umask(022);
+    if (!becomeRoot()) {
+        return refuse("Root's rights cannot be taken.");
     }
+    velt::setStateRoot(arguments[1]);
+    std::vector<std::string> remarks;
+    if (!velt::makeLoginRoot(login, arguments[3], remarks)) {
+        return refuse(velt::lastErrorSentence());
+    }
+    for (const std::string& remark : remarks) {
+        std::fprintf(stderr, "%s\n", velt::plainText(remark, 500).c_str());
+    }
+    return EXIT_SUCCESS;
 }
 
 } // namespace
 
 int main(int count, char** arguments) {
-    if (count < 4) {
-        std::fprintf(stderr, "usage: velt-share-root LIST FOLDER PROGRAM ARGUMENTS...\n");
-        return EXIT_FAILURE;
+    try {
+        return run(count, arguments);
+    } catch (const std::exception& error) {
+        return refuse(error.what());
     }
-    umask(022);
-    makeRoot(arguments[1], arguments[2]);
-    execv(arguments[3], arguments + 3);
-    giveUp(arguments[3]);
 }

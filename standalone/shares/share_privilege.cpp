@@ -12,11 +12,6 @@ namespace {
 // The kernel's own number for somebody who owns nothing.
 constexpr uid_t stranger = 65534;
 
-struct Identity {
-    uid_t uid = stranger;
-    std::vector<gid_t> gids;
-};
-
 std::optional<ShareGrant> grantOfGroups(const ShareEntry& share, const std::vector<gid_t>& gids) {
     std::optional<ShareGrant> best;
     for (const auto& [name, grant] : share.groups) {
@@ -32,35 +27,21 @@ std::optional<ShareGrant> grantOfGroups(const ShareEntry& share, const std::vect
     return best;
 }
 
-/// Looks the account up, and what the store grants it; nothing when there is no such account.
-std::optional<Identity> identify(const ShareEntry& share, const std::string& account,
-                                 std::optional<ShareGrant>& grant) {
-    if (const std::optional<UserEntry> user = userByName(account)) {
-        Identity identity{user->uid, groupsOf(*user)};
-        const auto entry = share.users.find(account);
-        grant =
-            entry != share.users.end() ? std::optional(entry->second) : grantOfGroups(share, identity.gids);
-        return identity;
-    }
-    if (const std::optional<GroupEntry> group = groupByName(account)) {
-        grant = grantOfGroups(share, {group->gid});
-        return Identity{stranger, {group->gid}};
-    }
-    return std::nullopt;
+std::optional<ShareGrant> grantOfUser(const ShareEntry& share, const std::string& name,
+                                      const std::vector<gid_t>& gids) {
+    const auto entry = share.users.find(name);
+    return entry != share.users.end() ? std::optional(entry->second) : grantOfGroups(share, gids);
 }
 
-} // namespace
-
-std::optional<SharePrivilege> privilegeOn(const ShareEntry& share, const std::string& account) {
-    std::optional<ShareGrant> grant;
-    const std::optional<Identity> identity = identify(share, account, grant);
-    if (!identity || !grant) {
+std::optional<SharePrivilege> lesserOf(const std::optional<ShareGrant>& grant, const ShareEntry& share,
+                                       uid_t uid, const std::vector<gid_t>& gids) {
+    if (!grant) {
         return SharePrivilege::none;
     }
     if (*grant == ShareGrant::none) {
         return SharePrivilege::denied;
     }
-    const std::optional<FolderAccess> allowed = folderAccess(share.path, identity->uid, identity->gids);
+    const std::optional<FolderAccess> allowed = folderAccess(share.path, uid, gids);
     if (!allowed) {
         return std::nullopt;
     }
@@ -69,6 +50,23 @@ std::optional<SharePrivilege> privilegeOn(const ShareEntry& share, const std::st
     }
     return *grant == ShareGrant::write && allowed->write ? SharePrivilege::readWrite
                                                          : SharePrivilege::readOnly;
+}
+
+} // namespace
+
+std::optional<SharePrivilege> privilegeOfUser(const ShareEntry& share, const std::string& name, uid_t uid,
+                                              const std::vector<gid_t>& gids) {
+    return lesserOf(grantOfUser(share, name, gids), share, uid, gids);
+}
+
+std::optional<SharePrivilege> privilegeOn(const ShareEntry& share, const std::string& account) {
+    if (const std::optional<UserEntry> user = userByName(account)) {
+        return privilegeOfUser(share, account, user->uid, groupsOf(*user));
+    }
+    if (const std::optional<GroupEntry> group = groupByName(account)) {
+        return lesserOf(grantOfGroups(share, {group->gid}), share, stranger, {group->gid});
+    }
+    return SharePrivilege::none;
 }
 
 } // namespace velt

@@ -4,8 +4,11 @@
 
 #include "standalone/shares/share_store.h"
 
+#include <sys/types.h>
+
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace velt {
 
@@ -22,6 +25,10 @@ enum class SharePrivilege {
 /// counts first, then the right to write. A group is checked in the file system as a stranger who belongs to
 /// it. Nothing, with the last error set, when the file system cannot be asked. Thread-safe.
 std::optional<SharePrivilege> privilegeOn(const ShareEntry& share, const std::string& account);
+
+/// The same for a user whose name and numbers are known already; `gids` has the primary group first.
+std::optional<SharePrivilege> privilegeOfUser(const ShareEntry& share, const std::string& name, uid_t uid,
+                                              const std::vector<gid_t>& gids);
 
 } // namespace velt
 

@@ -5,8 +5,6 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemon_plan.h"
-#include "standalone/proftpd/places.h"
 #include "standalone/shares/share_file.h"
 
 #include <cerrno>
@@ -49,20 +47,6 @@ std::optional<std::vector<ShareEntry>> readShares(const std::filesystem::path& p
     return shares;
 }
 
-int storeShares(const std::vector<ShareEntry>& shares) {
-    if (replaceFile(statePath(shareFile), renderShares(shares), 0644) < 0) {
-        return -1;
-    }
-    if (refreshShareMap() == 0) {
-        return 0;
-    }
-    // Without a map the logins that need one are refused; with the old one they would lead to where a share
-    // was.
-    std::error_code error;
-    std::filesystem::remove(ftpRunFolder() / "shares.map", error);
-    return -1;
-}
-
 } // namespace
 
 std::optional<std::vector<ShareEntry>> allShares() {
@@ -90,7 +74,8 @@ int saveShares(const std::vector<ShareEntry>& shares) {
     if (!lock) {
         return -1;
     }
-    return perform(Effect::store, "shares", [&shares] { return storeShares(shares); });
+    return perform(Effect::store, "shares",
+                   [&shares] { return replaceFile(statePath(shareFile), renderShares(shares), 0644); });
 }
 
 } // namespace velt

@@ -31,12 +31,10 @@ struct ShareEntry {
 /// file and what is wrong in it, when the file cannot be read or does not have its form. Thread-safe.
 std::optional<std::vector<ShareEntry>> allShares();
 
-/// Stores these shares in place of the stored ones; FTP logins that a chroot rule leads to a share find it
-/// where it is now, from the next one on. Whoever changes what allShares() returned holds a StateLock from
-/// before that call until after this one. Negative, with the last error set and nothing stored, when a share
-/// is not as above, when a name is there twice, or when the file cannot be written. Negative with the shares
-/// stored when only the FTP daemon cannot be told of them: logins by rules for shares are refused then until
-/// its next start. Thread-safe.
+/// Stores these shares in place of the stored ones; FTP logins follow them from the next one on. Whoever
+/// changes what allShares() returned holds a StateLock from before that call until after this one. Negative,
+/// with the last error set and nothing stored, when a share is not as above, when a name is there twice, or
+/// when the file cannot be written. Thread-safe.
 int saveShares(const std::vector<ShareEntry>& shares);
 
 /// Whether this is a name that a share may have.

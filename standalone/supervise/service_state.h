@@ -21,7 +21,7 @@ enum class RunState {
 
 struct ServiceState {
     RunState state = RunState::stopped;
-    ProcessId supervisor;
+    ProcessId supervisor;            ///< none when it ended after a failed start
     ProcessId daemon;                ///< none while paused or failed
     std::string configurationHash;   ///< what the daemon was started for
     std::vector<int> ports;          ///< on which the daemon listens

@@ -89,6 +89,8 @@ std::string Supervisor::begin(const DaemonOrder& order) {
     if (!reason.empty()) {
         control_.reset();
         endProcesses([] { return descendantsOf(::getpid()); }, patience);
+        finished_ = true;
+        publish(RunState::failed, reason);
     }
     return reason;
 }
@@ -254,7 +256,9 @@ void Supervisor::publish(RunState state, std::string reason) {
     state_ = state;
     ServiceState record;
     record.state = state;
-    record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+    if (!finished_) { // who is named there and gone was killed
+        record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+    }
     record.daemon = daemon_.id();
     record.configurationHash = order_.configurationHash;
     record.ports = order_.ports;

@@ -12,6 +12,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <regex>
@@ -41,7 +42,7 @@ public:
     const std::string& name() const { return name_; }
 
 private:
-    std::string name_ = "/tmp/velt-config-XXXXXX";
+    std::string name_ = (std::filesystem::temp_directory_path() / "velt-config-XXXXXX").string();
 };
 
 /// One setting: its name, a value on the command line and the same in a file, and how it arrives.

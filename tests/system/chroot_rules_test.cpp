@@ -112,8 +112,9 @@ TEST_F(ChrootRules, withSpecialCharactersNameThatFolderAndNoOther) {
     EXPECT_EQ(rootOf("alice"), "odd\r\n");
     fs::create_directory("/mnt/srv/music/alice");
     writeFile("/mnt/srv/music/alice/wrong", "");
+    writeFile("/mnt/srv/music/%u/right", "");
     saveRules({"u:1001:/music/%u"});
-    EXPECT_EQ(rootOf("alice"), "530") << "the daemon would put the name in its place";
+    EXPECT_EQ(rootOf("alice"), "right\r\n") << "the daemon does not put the name in its place";
 }
 
 TEST_F(ChrootRules, refuseTheLoginWithoutTheirFolder) {
@@ -128,9 +129,11 @@ TEST_F(ChrootRules, refuseAFolderThatLeadsOutOfItsShare) {
     start();
     fs::create_directory_symlink("/etc", "/mnt/srv/music/trap");
     fs::create_directory_symlink("below", "/mnt/srv/music/alias");
-    saveRules({"u:1001:/music/trap", "u:1002:/music/alias"});
+    fs::create_directory_symlink("../../home", "/mnt/srv/music/upwards");
+    saveRules({"u:1001:/music/trap", "u:1002:/music/alias", "u:1003:/music/upwards/carol"});
     EXPECT_EQ(rootOf("alice"), "530");
     EXPECT_EQ(rootOf("bob"), "deep\r\n");
+    EXPECT_EQ(rootOf("carol"), "530");
 }
 
 TEST_F(ChrootRules, refuseAllLoginsWithoutTheirFile) {

@@ -3,6 +3,12 @@
 
 #include "standalone/core/last_error.h"
 
+#include <linux/capability.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
 #include <filesystem>
 #include <iterator>
 
@@ -49,18 +55,25 @@ TEST_F(FtpPlan, changesWithWhatADaemonReadsAtItsStart) {
     expectChange("a limit");
     record.user_chroot = 0;
     expectChange("the root of unconfined users");
-    addShare("music", "music", ShareGrant::none);
-    expectChange("an offered share");
+    letAnonymousIn();
+    expectChange("anonymous users");
+    letAnonymousIn("music");
+    expectChange("their confinement");
+    letAnonymousIn("films");
+    expectChange("their share");
     offerTls(true);
     expectChange("FTPS");
     fs::remove_all(worldRoot / "var/lib/velt/tls");
     expectChange("the certificate");
 }
 
-TEST_F(FtpPlan, doesNotChangeWithTheRules) {
+TEST_F(FtpPlan, doesNotChangeWithWhatIsReadAtLogins) {
+    record.user_chroot = 0;
     addShare("music", "music", ShareGrant::none);
     const std::string before = hash();
     saveRules({"u:1001:/music"});
+    EXPECT_EQ(hash(), before);
+    addShare("films", "films", ShareGrant::none);
     EXPECT_EQ(hash(), before);
 }
 
@@ -69,6 +82,28 @@ TEST_F(FtpPlan, isRefusedWhenNeitherServiceIsEnabled) {
     ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
     EXPECT_FALSE(planFtpDaemon());
     EXPECT_EQ(lastErrorSentence(), "Neither FTP nor FTPS is enabled.");
+}
+
+TEST_F(FtpPlan, isRefusedWhereSessionsCannotHaveMountsOfTheirOwn) {
+    hash();
+    const pid_t child = fork();
+    if (child == 0) {
+        // Root without the right to make mounts, as in many containers.
+        __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
+        std::array<__user_cap_data_struct, 2> rights{};
+        syscall(SYS_capget, &header, rights.data());
+        rights[0].effective &= ~(1U << CAP_SYS_ADMIN);
+        syscall(SYS_capset, &header, rights.data());
+        const bool refused = !planFtpDaemon();
+        const bool told = lastErrorSentence() ==
+                          "The FTP service cannot confine its sessions here: mounts of "
+                          "their own are not possible (Operation not permitted).";
+        _exit(refused && told ? 0 : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+    EXPECT_TRUE(planFtpDaemon()) << lastErrorSentence();
 }
 
 TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {
@@ -83,12 +118,11 @@ TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {
     ASSERT_TRUE(former && next) << lastErrorSentence();
     EXPECT_NE(former->folder, next->folder);
     EXPECT_TRUE(fs::exists(former->folder / "proftpd.conf"));
-    EXPECT_EQ(fs::read_symlink(former->folder / "anonymous"), "/mnt/srv/one");
-    EXPECT_EQ(fs::read_symlink(next->folder / "anonymous"), "/mnt/srv/two");
+    EXPECT_EQ(readFileText(former->folder / "anonymous"), "one");
+    EXPECT_EQ(readFileText(next->folder / "anonymous"), "two");
     removeFormerPlans(*next);
     EXPECT_FALSE(fs::exists(former->folder));
     EXPECT_TRUE(fs::exists(next->folder / "proftpd.conf"));
-    EXPECT_TRUE(fs::exists("/mnt/srv/one")) << "a link is removed, not what it leads to";
 }
 
 TEST_F(FtpPlan, writesNothingWhenTheDaemonRefusesTheNewConfiguration) {

@@ -1,5 +1,6 @@
 // The SFTP service with real clients.
 #include "platform/sftp.h"
+#include "standalone/chroot/rule_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
@@ -116,6 +117,23 @@ TEST_F(SftpService, refusesRootAndStrangers) {
     start(port);
     EXPECT_NE(sftp("pwd\n", "root").exitCode, 0);
     EXPECT_NE(sftp("pwd\n", "carol").exitCode, 0) << "she has no key here";
+}
+
+// Rules and grants are FTP's; here the modes must say the same.
+TEST_F(SftpService, goesByTheRightsOfTheFileSystemAlone) {
+    fs::create_directories("/mnt/srv/share");
+    writeFile("/mnt/srv/share/open", "for all");
+    writeFile("/mnt/srv/share/own", "for root");
+    fs::permissions("/mnt/srv/share/own", fs::perms(0600));
+    const ShareEntry share{"share", "", "/mnt/srv/share", true, {{"alice", ShareGrant::none}}, {}};
+    ASSERT_EQ(saveShares({share}), 0) << lastErrorSentence();
+    ASSERT_EQ(velt::saveRules({{true, aliceId, "/home"}}), 0) << lastErrorSentence();
+    start(port);
+    EXPECT_EQ(sftp("get /mnt/srv/share/open /mnt/got\n").exitCode, 0);
+    EXPECT_EQ(readFileText("/mnt/got"), "for all");
+    EXPECT_NE(sftp("get /mnt/srv/share/own /mnt/got\n").exitCode, 0);
+    fs::remove("/mnt/got");
+    fs::remove_all("/mnt/srv/share");
 }
 
 TEST_F(SftpService, listensOnTheStoredPortOnly) {

@@ -104,5 +104,19 @@ TEST_F(UnprivilegedFtp, refusesLoginsThatItCannotConfine) {
     EXPECT_EQ(FtpSession(port).logIn("guest"), 530);
 }
 
+TEST_F(UnprivilegedFtp, refusesLoginsWithARule) {
+    record.user_chroot = 0;
+    startUnprivileged();
+    const fs::path rules = root_ / "etc/velt/chroot_rules";
+    for (const char* rule : {"u:1003:/home", "u:1003:/music", "g:1003:/home"}) {
+        writeFile(rules, "velt-chroot-rules 1\n" + std::string(rule) + "\n", carolId);
+        EXPECT_EQ(FtpSession(port).logIn("guest"), 530) << rule;
+    }
+    writeFile(rules, "velt-chroot-rules 1\nu:1002:/home\n", carolId);
+    EXPECT_EQ(FtpSession(port).logIn("guest"), 230);
+    fs::remove(rules);
+    EXPECT_EQ(FtpSession(port).logIn("guest"), 530);
+}
+
 } // namespace
 } // namespace velt::test

@@ -67,6 +67,17 @@ TEST_F(NameServiceTest, FindsGroupsAndMemberships) {
     EXPECT_EQ(groupsOf(*userByName("OFFICE\\anna")), (std::vector<gid_t>{4'000'000, 4'000'001, 4'000'002}));
 }
 
+TEST_F(NameServiceTest, AGroupIsFoundWithoutAListingOfAllUsers) {
+    using namespace std::chrono_literals;
+    useServices("passwd: files winbind\n", FAKE_MODULE_FOLDER);
+    ASSERT_EQ(setenv("FAKE_NSS_DELAY_MS", "3000", 1), 0);
+    const auto begin = std::chrono::steady_clock::now();
+    EXPECT_TRUE(groupByName("winbind-people"));
+    EXPECT_TRUE(groupById(4'000'001));
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, 2s);
+    unsetenv("FAKE_NSS_DELAY_MS");
+}
+
 TEST_F(NameServiceTest, ASlowDomainHoldsUpNobodyWhoKnowsItsFormerAnswer) {
     using namespace std::chrono_literals;
     useServices("passwd: files winbind\n", FAKE_MODULE_FOLDER, 0s);

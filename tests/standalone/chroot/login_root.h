@@ -1,17 +1,28 @@
-/* Asks the FTP daemon's module for the root directory of a login, with a stand-in for the daemon around it.
- * */
+/* Lets the FTP daemon's module decide on a login, with a stand-in for the daemon around it. */
 #ifndef VELT_TESTS_STANDALONE_CHROOT_LOGIN_ROOT_H
 #define VELT_TESTS_STANDALONE_CHROOT_LOGIN_ROOT_H
 
-/* What the daemon would answer the module. The account is uid 1001, gid 1001, of the group 2001 besides. */
 struct login_world {
-    const char* rules_file;
-    const char* share_map;
+    const char* program;    /* "": no VeltLoginRoot in the configuration */
+    const char* state_root; /* handed to the program */
     int knows_user;
-    int knows_groups; /* else the look-up of the groups fails */
+    int knows_groups;
+    int code; /* what the daemon says of the password; negative: wrong */
 };
 
-/* The DefaultRoot that holds for the login then; "" for none. Valid until the next call. */
-const char* root_of(const struct login_world* world);
+enum login_end {
+    login_granted,
+    login_wrong,        /* as a wrong password */
+    login_disconnected, /* at the change of the root directory */
+};
+
+/* How the login of "alice" (1001, groups 1001 and 2001) ends. */
+enum login_end log_in(const struct login_world* world);
+
+/* How it ends when the root directory changes although nobody was told of a password. */
+enum login_end change_root_unasked(const struct login_world* world);
+
+/* What the module wrote to the log in the last call; "" when nothing. */
+const char* logged(void);
 
 #endif

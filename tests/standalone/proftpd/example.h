@@ -22,10 +22,10 @@ inline ProftpdPlaces places() {
     ProftpdPlaces places;
     places.moduleFolder = "/usr/libexec/velt";
     places.runFolder = "/run/velt/ftp";
-    places.chrootRules = "/etc/velt/chroot_rules";
-    places.shareMap = "/run/velt/ftp/shares.map";
-    places.shareRoot = "/run/velt/ftp/shares";
-    places.anonymousLink = "/run/velt/ftp/links/anonymous";
+    places.loginProgram = "/usr/libexec/velt/velt-share-root";
+    places.stateRoot = "/";
+    places.loginRoot = "/run/velt/ftp/root";
+    places.anonymousShare = "/run/velt/ftp/configurations/0/anonymous";
     places.certificate = "/etc/velt/tls/server.crt";
     places.certificateKey = "/etc/velt/tls/server.key";
     return places;

@@ -108,11 +108,6 @@ const Case cases[] = {
     {"umask_off", [](auto& s, auto&) { s.umask = false; }},
     {"users_unconfined", [](auto& s, auto&) { s.record.user_chroot = 0; }},
     {"anonymous_share", [](auto& s, auto&) { enableAnonymous(s, true); }},
-    {"anonymous_share_writable",
-     [](auto& s, auto& p) {
-         enableAnonymous(s, true);
-         p.anonymousMayWrite = true;
-     }},
     {"anonymous_all_shares", [](auto& s, auto&) { enableAnonymous(s, false); }},
     {"ipv4_only", [](auto&, auto& p) { p.ipv6 = false; }},
     {"loopback_only", [](auto&, auto& p) { p.loopbackOnly = true; }},

@@ -1,4 +1,3 @@
-#include "standalone/proftpd/share_lists.h"
 #include "tests/standalone/proftpd/example.h"
 
 #include <gtest/gtest.h>
@@ -54,11 +53,14 @@ TEST(Injection, portIsWrittenAsANumber) {
 TEST(Injection, noLineOfTheConfigurationReachesTheDaemonsLimit) {
     ProftpdPlaces here = places();
     const std::filesystem::path deep = '/' + std::string(900, 'd');
-    here.chrootRules = deep / "rules";
-    here.shareMap = deep / "map";
-    here.shareRoot = deep / "shares";
+    here.loginProgram = deep / "program";
+    here.stateRoot = deep;
+    here.loginRoot = deep / "root";
+    here.anonymousShare = deep / "anonymous";
     FtpSettings settings = plainSettings();
     settings.record.user_chroot = 0;
+    settings.record.anonymous = 1;
+    settings.record.anonymous_chroot = 1;
     const std::string text = renderProftpd(settings, here);
     for (std::size_t start = 0; start < text.size(); start = text.find('\n', start) + 1) {
         EXPECT_LT(text.find('\n', start) - start, 4000U);
@@ -71,27 +73,6 @@ TEST(Injection, placesWithMeaningfulCharactersAreRefused) {
         EXPECT_FALSE(isRenderable(path)) << path;
     }
     EXPECT_FALSE(isRenderable('/' + std::string(1024, 'x')));
-}
-
-TEST(ShareLists, nameEveryShareForTheRulesAndTheOfferedOnesForTheSharedRoot) {
-    const std::vector<ShareEntry> shares = {
-        {"a b", "", "/srv/a b", true, {}, {}},
-        {"hidden", "", "/srv/hidden", false, {}, {}},
-        {"public", "", "/srv/public", true, {}, {}},
-    };
-    EXPECT_EQ(shareMapText(shares), "velt-share-map 1\n"
-                                    "a b\t/srv/a b\n"
-                                    "hidden\t/srv/hidden\n"
-                                    "public\t/srv/public\n");
-    const auto access = [](const ShareEntry& share) {
-        return share.name == "public" ? AnonymousAccess::read : AnonymousAccess::none;
-    };
-    EXPECT_EQ(mountListText(shares, access), "rw\tusers/a b\t/srv/a b\n"
-                                             "rw\tusers/public\t/srv/public\n"
-                                             "ro\tanonymous/public\t/srv/public\n");
-    EXPECT_EQ(mountListText({shares[2]}, [](const ShareEntry&) { return AnonymousAccess::write; }),
-              "rw\tusers/public\t/srv/public\n"
-              "rw\tanonymous/public\t/srv/public\n");
 }
 
 } // namespace

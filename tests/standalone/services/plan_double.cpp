@@ -55,10 +55,6 @@ std::optional<DaemonPlan> planSftpDaemon() {
                     : std::nullopt;
 }
 
-int refreshShareMap() {
-    return 0;
-}
-
 int testFtpCandidate(const FtpSettings&) {
     return test::refuseIfAsked();
 }

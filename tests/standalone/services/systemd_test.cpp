@@ -3,6 +3,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
 #include "standalone/installed_files.h"
 #include "standalone/services/supervise_backend.h"
@@ -155,7 +156,7 @@ TEST_F(SystemdTest, AKilledSupervisorComesBackWithTheSettingsThatWereTakenUpLast
     port_ = freePort();
     start("two");
     killSupervisor();
-    ASSERT_EQ(std::system((places_.systemctl + " restart velt-sftp.service").c_str()), 0);
+    ASSERT_EQ(runProcess({places_.systemctl, "restart", "velt-sftp.service"}).exitCode, 0);
     EXPECT_TRUE(accepts(port_));
     EXPECT_FALSE(accepts(former));
     EXPECT_EQ(backend_->state().configurationHash, "two");

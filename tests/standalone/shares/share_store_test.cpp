@@ -57,21 +57,6 @@ TEST_F(ShareStoreTest, SeesEachStoreAtOnce) {
     }
 }
 
-TEST_F(ShareStoreTest, TellsTheFtpDaemonWhereTheSharesAreNow) {
-    ASSERT_EQ(saveShares({shareCalled("a"), shareCalled("b")}), 0) << lastErrorSentence();
-    EXPECT_EQ(folder_.read("/run/velt/ftp/shares.map"), "velt-share-map 1\na\t/srv/a\nb\t/srv/b\n");
-    ASSERT_EQ(saveShares({shareCalled("b")}), 0) << lastErrorSentence();
-    EXPECT_EQ(folder_.read("/run/velt/ftp/shares.map"), "velt-share-map 1\nb\t/srv/b\n");
-}
-
-TEST_F(ShareStoreTest, LeavesNoMapOfFormerSharesWhenANewOneCannotBeWritten) {
-    ASSERT_EQ(saveShares({shareCalled("a")}), 0) << lastErrorSentence();
-    std::filesystem::create_directory(folder_.path() / "run/velt/ftp/.shares.map.new");
-    EXPECT_LT(saveShares({shareCalled("b")}), 0);
-    EXPECT_FALSE(std::filesystem::exists(folder_.path() / "run/velt/ftp/shares.map"));
-    EXPECT_EQ(allShares()->at(0).name, "b");
-}
-
 TEST_F(ShareStoreTest, AFlawedShareIsNotStored) {
     ASSERT_EQ(saveShares({shareCalled("good")}), 0);
     const std::string before = folder_.read("/etc/velt/shares.json");

@@ -41,7 +41,10 @@ fs::path FtpService::addShare(const std::string& name, const std::string& folder
     fs::create_directories(path);
     EXPECT_EQ(chmod(path.c_str(), 0777), 0);
     ShareEntry share{name, "", path, offered, {}, {}};
-    share.users["ftp"] = anonymous;
+    share.users = {{"ftp", anonymous},
+                   {"alice", ShareGrant::write},
+                   {"bob", ShareGrant::write},
+                   {"carol", ShareGrant::write}};
     shares_.push_back(share);
     EXPECT_EQ(velt::saveShares(shares_), 0) << lastErrorSentence();
     return path;

@@ -32,7 +32,8 @@ protected:
     }
     void letAnonymousIn(const std::string& share = {});
 
-    /// A folder below /mnt/srv, owned by root with mode 0777, and a share for it.
+    /// A folder below /mnt/srv, owned by root with mode 0777, and a share for it, in which alice, bob and
+    /// carol may write.
     std::filesystem::path addShare(const std::string& name, const std::string& folder, ShareGrant anonymous,
                                    bool offered = true);
 
