@@ -3,9 +3,18 @@
 #include "cli/json_text.h"
 #include "cli/problem.h"
 
+#include <chrono>
+#include <thread>
+
 namespace velt::cli {
 
 namespace {
+
+constexpr long preconditionFailed = 412;
+constexpr int mostAttempts = 20;
+
+/// Somebody else has changed something since it was read.
+struct Outdated {};
 
 std::string pathOf(const ApiMethod& method) {
     return "/api/" + percentEncode(method.api) + "/v" + std::to_string(method.version) + "/" +
@@ -16,7 +25,14 @@ std::string pathOf(const ApiMethod& method) {
 
 Json::Value ApiClient::exchange(const std::string& method, const std::string& path,
                                 const std::optional<std::string>& body) {
-    const HttpAnswer answer = http_.send(method, path, body);
+    const bool conditional = watching_ && body;
+    const HttpAnswer answer = http_.send(method, path, body, conditional ? seen_ : "");
+    if (conditional && answer.status == preconditionFailed) {
+        throw Outdated();
+    }
+    if (watching_ && (conditional || seen_.empty())) {
+        seen_ = answer.etag;
+    }
     if (answer.status == 204) {
         return {};
     }
@@ -38,6 +54,26 @@ Json::Value ApiClient::read(const ApiMethod& method) {
 
 Json::Value ApiClient::call(const ApiMethod& method, const Json::Value& parameters) {
     return post(pathOf(method), parameters);
+}
+
+void ApiClient::changeWhatWasRead(const std::function<void()>& change) {
+    for (int attempt = 1; attempt <= mostAttempts; ++attempt) {
+        watching_ = true;
+        seen_.clear();
+        try {
+            change();
+            watching_ = false;
+            return;
+        } catch (const Outdated&) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(10 * attempt));
+        } catch (...) {
+            watching_ = false;
+            throw;
+        }
+    }
+    watching_ = false;
+    throw Failure(ExitCode::conflict, "Others change the settings all the time.",
+                  "Try again when they have finished. Nothing was changed.");
 }
 
 Json::Value ApiClient::get(const std::string& path) {

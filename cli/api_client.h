@@ -30,6 +30,11 @@ public:
     /// Any method with its parameters. Null when the method answers without a value.
     Json::Value call(const ApiMethod& method, const Json::Value& parameters);
 
+    /// Runs `change`, which reads what it builds upon and then calls what it changes. When somebody else
+    /// changes something in between, the server refuses the call and the whole of `change` runs again, with
+    /// what is true then; Failure (conflict) when that happens again and again.
+    void changeWhatWasRead(const std::function<void()>& change);
+
     /// The endpoints beside the methods; `path` starts with a slash.
     Json::Value get(const std::string& path);
     Json::Value post(const std::string& path, const Json::Value& body);
@@ -46,6 +51,8 @@ private:
                          const std::optional<std::string>& body);
 
     HttpClient http_;
+    bool watching_ = false; ///< within changeWhatWasRead
+    std::string seen_;      ///< the state at its first read, or after its last call
 };
 
 } // namespace velt::cli

@@ -65,7 +65,7 @@ void replaceRules(Session& session, const RuleOptions& options) {
         }
         throw Failure(failure);
     }
-    saveRules(session.api, rules);
+    session.api.changeWhatWasRead([&] { saveRules(session.api, rules, loadRules(session.api)); });
     writeRules(session, rules);
 }
 
@@ -76,17 +76,20 @@ void addRule(Session& session, const RuleOptions& options) {
         throw Failure(ExitCode::usage, faults.front().substr(faults.front().find(": ") + 2) + ".",
                       "For example: veltctl chroot rules add user NAME /SHARE");
     }
-    ChrootRules rules = loadRules(session.api);
-    if (std::find(rules.begin(), rules.end(), options.rule) == rules.end()) {
-        rules.push_back(options.rule);
-        saveRules(session.api, rules);
-    }
+    ChrootRules rules;
+    session.api.changeWhatWasRead([&] {
+        const ChrootRules before = loadRules(session.api);
+        rules = before;
+        if (std::find(rules.begin(), rules.end(), options.rule) == rules.end()) {
+            rules.push_back(options.rule);
+            saveRules(session.api, rules, before);
+        }
+    });
     writeRules(session, rules);
 }
 
-void removeRule(Session& session, const RuleOptions& options) {
-    const ChrootRule& wanted = options.rule;
-    ChrootRules rules = loadRules(session.api);
+// The rules without those that the options name; Failure when there is none of these.
+ChrootRules rulesWithout(ChrootRules rules, const ChrootRule& wanted) {
     const std::size_t removed = std::erase_if(rules, [&](const ChrootRule& rule) {
         return rule.type == wanted.type && rule.name == wanted.name &&
                (wanted.path.empty() || rule.path == wanted.path);
@@ -97,7 +100,16 @@ void removeRule(Session& session, const RuleOptions& options) {
                       "There is no rule for the " + wanted.type + " " + wanted.name + place + ".",
                       "'veltctl chroot rules load' shows the rules. Nothing was changed.");
     }
-    saveRules(session.api, rules);
+    return rules;
+}
+
+void removeRule(Session& session, const RuleOptions& options) {
+    ChrootRules rules;
+    session.api.changeWhatWasRead([&] {
+        const ChrootRules before = loadRules(session.api);
+        rules = rulesWithout(before, options.rule);
+        saveRules(session.api, rules, before);
+    });
     writeRules(session, rules);
 }
 

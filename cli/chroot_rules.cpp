@@ -34,6 +34,12 @@ std::string faultOf(const Json::Value& object) {
                                                          : "";
 }
 
+void store(ApiClient& api, const ChrootRules& rules) {
+    Json::Value parameters;
+    parameters["rules"] = rulesToJson(rules);
+    api.call(saveMethod, parameters);
+}
+
 } // namespace
 
 std::string ruleToText(const ChrootRule& rule) {
@@ -81,21 +87,20 @@ ChrootRules loadRules(ApiClient& api) {
     return rules;
 }
 
-void saveRules(ApiClient& api, const ChrootRules& rules) {
-    Json::Value parameters;
-    parameters["rules"] = rulesToJson(rules);
-    api.call(saveMethod, parameters);
-
+void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before) {
+    store(api, rules);
     const ChrootRules stored = loadRules(api);
-    Failure dropped(ExitCode::refused,
-                    "Some rules were left out: the server does not know their user or group.",
-                    "Correct these names and save again; the other rules are stored.");
+    Failure dropped(
+        ExitCode::refused,
+        "The server left out rules: it does not know the user or group, or takes no such directory.",
+        "Correct these rules and try again. The rules are as they were before.");
     for (const ChrootRule& rule : rules) {
         if (std::find(stored.begin(), stored.end(), rule) == stored.end()) {
             dropped.note("left out: " + ruleToText(rule));
         }
     }
     if (!dropped.notes().empty()) {
+        store(api, before);
         throw Failure(dropped);
     }
 }

@@ -31,9 +31,10 @@ ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& fa
 /// What the server has stored.
 ChrootRules loadRules(ApiClient& api);
 
-/// Stores the rules in place of all stored ones, and loads them again: the server leaves out rules whose user
-/// or group it does not know. Throws Failure (refused) that names them.
-void saveRules(ApiClient& api, const ChrootRules& rules);
+/// Stores the rules in place of all stored ones, which are `before`, and loads them again: the server leaves
+/// out rules that it cannot keep. All of `before` is stored again then, and Failure (refused) names these
+/// rules.
+void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before);
 
 } // namespace velt::cli
 

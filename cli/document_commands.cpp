@@ -106,9 +106,6 @@ void applySteps(Session& session, const ImportPlan& plan) {
 void importFrom(Session& session, const DocumentOptions& options) {
     const Json::Value document = readDocument(session, options.file);
     const ImportPlan plan = planImport(session.api, document);
-    for (const std::string& warning : plan.warnings) {
-        session.console.err << "veltctl: warning: " << printable(warning) << '\n';
-    }
     if (!options.dryRun) {
         applySteps(session, plan);
         return;

@@ -177,14 +177,21 @@ void HttpClient::perform(bool mayBeStopped) {
         throw noAnswer(endpoint_, curl, code, handle_->reason);
     }
     curl_easy_getinfo(curl, CURLINFO_RESPONSE_CODE, &transfer.answer.status);
+    curl_header* etag = nullptr;
+    if (curl_easy_header(curl, "ETag", 0, CURLH_HEADER, -1, &etag) == CURLHE_OK) {
+        transfer.answer.etag = etag->value;
+    }
 }
 
 HttpAnswer HttpClient::send(const std::string& method, const std::string& path,
-                            const std::optional<std::string>& body) {
+                            const std::optional<std::string>& body, const std::string& ifMatch) {
     prepare(path);
     CURL* curl = handle_->curl;
     curl_easy_setopt(curl, CURLOPT_TIMEOUT, static_cast<long>(endpoint_.timeoutSeconds));
     handle_->addHeader("Accept: application/json, application/problem+json");
+    if (!ifMatch.empty()) {
+        handle_->addHeader("If-Match: " + ifMatch);
+    }
     if (body) {
         handle_->addHeader("Content-Type: application/json");
         curl_easy_setopt(curl, CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(body->size()));

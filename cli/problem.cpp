@@ -33,6 +33,7 @@ std::string messageOf(long status) {
     case 403:
         return "The server does not allow this";
     case 404:
+        return "The server does not have what was asked for";
     case 405:
         return "The server has no such method";
     case 408:
@@ -79,7 +80,7 @@ std::string hintOf(const HttpAnswer& answer, const Json::Value& problem, const E
         return accessHint(answer.status, endpoint);
     case 404:
     case 405:
-        return "'veltctl call --list' shows what the server can do.";
+        return "'veltctl call --list' shows the methods, 'veltctl tokens list' the tokens.";
     case 408:
     case 429:
         return "Try again in a moment.";
@@ -87,6 +88,9 @@ std::string hintOf(const HttpAnswer& answer, const Json::Value& problem, const E
         return conflictHint(problem);
     default:
         break;
+    }
+    if (answer.status >= 500 && problem["changed"] == false) {
+        return "Correct what the server names, in the request or on the server, and try again.";
     }
     if (answer.status >= 500) {
         return "A part of the change may be in effect: look with 'veltctl status' and 'veltctl log'; the "

@@ -46,6 +46,7 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     app.footer(exitCodes);
     addGlobalOptions(app, options);
     addStatusCommands(app, chosen);
+    addLogCommand(app, chosen);
     addSettingsCommands(app, chosen);
     addShareCommands(app, chosen);
     addChrootCommands(app, chosen);

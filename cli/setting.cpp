@@ -96,8 +96,8 @@ SettingGroup ftpSettings(int version) {
     return {"ftp",
             ftpApi,
             version,
-            {{"enable_ftp", boolean, "plain FTP runs", true},
-             {"enable_ftps", boolean, "FTP over TLS runs", true},
+            {{"enable_ftp", boolean, "plain FTP runs", "ftp"},
+             {"enable_ftps", boolean, "FTP over TLS runs", "ftps"},
              {"timeout", integer, "seconds after which an idle connection ends"},
              {"portnum", integer, "control port"},
              {"custom_port_range", boolean, "the passive range is custom_port, not the default"},
@@ -126,7 +126,7 @@ SettingGroup securitySettings() {
 }
 
 SettingGroup sftpSettings() {
-    return {"sftp", sftpApi, 1, {{"enable", boolean, "SFTP runs", true}, {"portnum", integer, "port"}}};
+    return {"sftp", sftpApi, 1, {{"enable", boolean, "SFTP runs", "sftp"}, {"portnum", integer, "port"}}};
 }
 
 const char* describe(SettingType type) {
@@ -175,6 +175,10 @@ Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::s
             throw Failure(ExitCode::usage, "\"" + word.substr(equals + 1) + "\" is no value for " + key + ".",
                           "Give " + std::string(describe(setting->type)) + ".");
         }
+        if (key == "custom_port" && value->asString().empty()) {
+            throw Failure(ExitCode::usage, "custom_port cannot be empty.",
+                          "Give FIRST:LAST, or custom_port_range=off for the default range.");
+        }
         result[key] = *value;
     }
     return result;
@@ -183,12 +187,16 @@ Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::s
 Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted, const Json::Value& current) {
     Json::Value change = wanted;
     for (const Setting& setting : group.settings) {
-        if (setting.required && !change.isMember(setting.key)) {
+        if (setting.service != nullptr && !change.isMember(setting.key)) {
             change[setting.key] = current[setting.key];
         }
     }
     if (group.find("custom_port") != nullptr) {
         completePassiveRange(change, current);
+    }
+    // The server takes no empty address, but one that is blank it keeps as none.
+    if (change.isMember("ext_ip") && change["ext_ip"].asString().empty()) {
+        change["ext_ip"] = " ";
     }
     return change;
 }

@@ -21,7 +21,9 @@ struct Setting {
     const char* key = nullptr;
     SettingType type = SettingType::text;
     const char* meaning = nullptr;
-    bool required = false; ///< every change must name it, changed or not
+    /// The service, as the server's status names it, that this setting switches on and off. Every change must
+    /// name such a setting, changed or not.
+    const char* service = nullptr;
 };
 
 /// The settings behind one "get" and one "set".

@@ -2,6 +2,7 @@
 
 #include "cli/failure.h"
 #include "cli/json_text.h"
+#include "cli/stored_switches.h"
 #include "cli/table.h"
 
 #include <CLI/CLI.hpp>
@@ -112,7 +113,7 @@ void addGroup(CLI::App& app, Command& chosen, const std::string& title,
 Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
     Json::Value current = api.read(group.method("get"));
     const auto missing = [&](const Setting& setting) {
-        return setting.required && !hasType(current[setting.key], setting.type);
+        return setting.service != nullptr && !hasType(current[setting.key], setting.type);
     };
     if (!current.isObject() || std::any_of(group.settings.begin(), group.settings.end(), missing)) {
         throw Failure(ExitCode::platform,
@@ -139,10 +140,19 @@ void showSettings(Session& session, const SettingGroup& group) {
 
 void changeSettings(Session& session, const SettingGroup& group, const std::vector<std::string>& words) {
     const Json::Value wanted = parseAssignments(group, words);
-    const Json::Value before = readSettings(session.api, group);
-    session.api.call(group.method("set"), completeChange(group, wanted, before));
+    Json::Value before;
+    std::vector<std::string> doubts;
+    session.api.changeWhatWasRead([&] {
+        before = readSettings(session.api, group);
+        const StoredSwitches switches = readStoredSwitches(session.api, group, wanted, before);
+        doubts = switches.doubts;
+        session.api.call(group.method("set"), completeChange(group, wanted, switches.values));
+    });
     const Json::Value after = readBack(session, group);
     writeChanges(session, differences(group, before, after), after);
+    for (const std::string& doubt : doubts) {
+        session.console.err << "veltctl: warning: " << printable(doubt) << '\n';
+    }
     warnOfKeptValues(session, wanted, after);
 }
 

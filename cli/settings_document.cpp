@@ -1,10 +1,11 @@
 #include "cli/settings_document.h"
 
 #include "cli/failure.h"
-#include "cli/json_text.h"
+#include "cli/stored_switches.h"
 #include "cli/table.h"
 
 #include <algorithm>
+#include <charconv>
 
 namespace velt::cli {
 
@@ -16,6 +17,31 @@ constexpr const char* rulesSection = "chroot_rules";
 
 std::vector<SettingGroup> groupsInOrder() {
     return {securitySettings(), ftpSettings(), sftpSettings()};
+}
+
+// Whether a passive range of the form FIRST:LAST has the port.
+bool inRange(const std::string& range, int port) {
+    int first = 0;
+    int last = 0;
+    const char* const end = range.data() + range.size();
+    const auto colon = std::from_chars(range.data(), end, first);
+    if (colon.ec != std::errc() || colon.ptr == end || *colon.ptr != ':' ||
+        std::from_chars(colon.ptr + 1, end, last).ec != std::errc()) {
+        return false;
+    }
+    return first <= port && port <= last;
+}
+
+// A port that SFTP holds now and gives up in the document is free for FTP only after SFTP has moved.
+bool sftpMovesFirst(ApiClient& api, const Json::Value& document) {
+    if (!document.isMember("ftp") || !document.isMember("sftp")) {
+        return false;
+    }
+    const int port = readSettings(api, sftpSettings())["portnum"].asInt();
+    const Json::Value& ftp = document["ftp"];
+    const bool inWay = ftp["portnum"] == port ||
+                       (ftp["custom_port_range"] == true && inRange(ftp["custom_port"].asString(), port));
+    return inWay && document["sftp"]["portnum"].isInt() && document["sftp"]["portnum"] != port;
 }
 
 // Only what is known: a key of a newer server would make the document one that cannot be imported.
@@ -72,16 +98,7 @@ void dropIdlePassiveRange(Json::Value& wanted, const Json::Value& section, const
     }
 }
 
-void dropEmptyAddress(Json::Value& wanted, const Json::Value& current, std::vector<std::string>& warnings) {
-    if (wanted.isMember("ext_ip") && wanted["ext_ip"].asString().empty()) {
-        warnings.push_back("ftp.ext_ip stays " + displayValue(current["ext_ip"]) +
-                           ": the server takes no empty address; set use_ext_ip to off instead.");
-        wanted.removeMember("ext_ip");
-    }
-}
-
-Json::Value wantedOf(const SettingGroup& group, const Json::Value& section, const Json::Value& current,
-                     std::vector<std::string>& warnings) {
+Json::Value wantedOf(const SettingGroup& group, const Json::Value& section, const Json::Value& current) {
     Json::Value wanted(Json::objectValue);
     for (const std::string& key : section.getMemberNames()) {
         if (section[key] != current[key]) {
@@ -90,14 +107,39 @@ Json::Value wantedOf(const SettingGroup& group, const Json::Value& section, cons
     }
     if (group.find("custom_port") != nullptr) {
         dropIdlePassiveRange(wanted, section, current);
-        dropEmptyAddress(wanted, current, warnings);
     }
     return wanted;
 }
 
+// The server refuses a passive range over the control port of the moment, even when the same request moves
+// that port away: the port moves first then, beside the default range.
+std::vector<Json::Value> requestsFor(const Json::Value& wanted, const Json::Value& current) {
+    if (!wanted.isMember("portnum") || !wanted.isMember("custom_port") ||
+        !inRange(wanted["custom_port"].asString(), current["portnum"].asInt())) {
+        return {wanted};
+    }
+    Json::Value first = wanted;
+    first.removeMember("custom_port");
+    first["custom_port_range"] = false;
+    Json::Value second(Json::objectValue);
+    second["custom_port_range"] = true;
+    second["custom_port"] = wanted["custom_port"];
+    return {first, second};
+}
+
+void change(ApiClient& api, const SettingGroup& group, const Json::Value& wanted) {
+    api.changeWhatWasRead([&] {
+        const Json::Value current = readSettings(api, group);
+        api.call(group.method("set"),
+                 completeChange(group, wanted, readStoredSwitches(api, group, wanted, current).values));
+    });
+}
+
 void planGroup(ApiClient& api, const SettingGroup& group, const Json::Value& section, ImportPlan& plan) {
-    const Json::Value current = readSettings(api, group);
-    const Json::Value wanted = wantedOf(group, section, current, plan.warnings);
+    const StoredSwitches switches =
+        readStoredSwitches(api, group, Json::Value(Json::objectValue), readSettings(api, group));
+    const Json::Value& current = switches.values;
+    const Json::Value wanted = wantedOf(group, section, current);
     ImportStep step;
     step.section = group.command;
     for (const Setting& setting : group.settings) {
@@ -111,8 +153,11 @@ void planGroup(ApiClient& api, const SettingGroup& group, const Json::Value& sec
     if (step.changes.empty()) {
         return;
     }
-    const Json::Value parameters = completeChange(group, wanted, current);
-    step.apply = [&api, method = group.method("set"), parameters] { api.call(method, parameters); };
+    step.apply = [&api, group, requests = requestsFor(wanted, current)] {
+        for (const Json::Value& request : requests) {
+            change(api, group, request);
+        }
+    };
     plan.steps.push_back(std::move(step));
 }
 
@@ -142,7 +187,7 @@ void planRules(ApiClient& api, const Json::Value& array, ImportPlan& plan) {
         step.changes.emplace_back("another order of the same rules");
     }
     step.changesJson.append(changeToJson({"rules", rulesToJson(current), rulesToJson(wanted)}));
-    step.apply = [&api, wanted] { saveRules(api, wanted); };
+    step.apply = [&api, wanted] { api.changeWhatWasRead([&] { saveRules(api, wanted, loadRules(api)); }); };
     plan.steps.push_back(std::move(step));
 }
 
@@ -154,7 +199,9 @@ Json::Value exportSettings(ApiClient& api) {
     document["format_version"] = formatVersion;
     document[rulesSection] = rulesToJson(loadRules(api));
     for (const SettingGroup& group : groupsInOrder()) {
-        document[group.command] = knownSettings(group, readSettings(api, group));
+        const Json::Value current = readSettings(api, group);
+        document[group.command] = knownSettings(
+            group, readStoredSwitches(api, group, Json::Value(Json::objectValue), current).values);
     }
     return document;
 }
@@ -186,7 +233,11 @@ ImportPlan planImport(ApiClient& api, const Json::Value& document) {
     if (document.isMember(rulesSection)) {
         planRules(api, document[rulesSection], plan);
     }
-    for (const SettingGroup& group : groupsInOrder()) {
+    std::vector<SettingGroup> groups = groupsInOrder();
+    if (sftpMovesFirst(api, document)) {
+        std::swap(groups[1], groups[2]);
+    }
+    for (const SettingGroup& group : groups) {
         if (document.isMember(group.command)) {
             planGroup(api, group, document[group.command], plan);
         }

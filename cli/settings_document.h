@@ -7,7 +7,8 @@
 
 namespace velt::cli {
 
-/// The whole of a server's settings: "format", "format_version", "chroot_rules", "security", "ftp", "sftp".
+/// The whole of a server's settings, services that are switched on and down as switched on: "format",
+/// "format_version", "chroot_rules", "security", "ftp", "sftp".
 Json::Value exportSettings(ApiClient& api);
 
 /// Every fault of a document, in words; none: it can be imported. Sections and keys may be absent, but none
@@ -25,7 +26,6 @@ struct ImportStep {
 struct ImportPlan {
     /// Confinement first, the services last: nothing opens before its limits are in force.
     std::vector<ImportStep> steps;
-    std::vector<std::string> warnings; ///< what the document asks and the server cannot do
 };
 
 /// Compares a document without faults with the server. Nothing is changed before the steps are applied; `api`

@@ -7,6 +7,7 @@
 
 #include <CLI/CLI.hpp>
 
+#include <algorithm>
 #include <ctime>
 #include <memory>
 #include <ostream>
@@ -15,7 +16,28 @@ namespace velt::cli {
 
 namespace {
 
-constexpr int defaultPage = 50;
+// A service that is to run and does not is what an administrator looks for.
+std::string stateOf(const Json::Value& service) {
+    if (!service.isObject() || service["running"] != false) {
+        return textAt(service, "enabled");
+    }
+    const bool shallRun = service["wanted"] == true || service["enabled"] == true;
+    return shallRun ? "down" : textAt(service, "enabled");
+}
+
+/// Why services do not follow their settings; those of one daemon have one reason.
+void writeReasons(Session& session, const Json::Value& services) {
+    std::string last;
+    for (const Json::Value& service : services) {
+        const bool given = service.isObject() && service["reason"].isString();
+        const std::string reason = given ? service["reason"].asString() : "";
+        if (!reason.empty() && reason != last) {
+            session.console.out << '\n'
+                                << printable(textAt(service, "name")) << ": " << printable(reason) << '\n';
+        }
+        last = reason;
+    }
+}
 
 void showStatus(Session& session) {
     const Json::Value status = session.api.get("/api/status");
@@ -27,80 +49,16 @@ void showStatus(Session& session) {
                         << durationText(status["uptime_seconds"].asInt64()) << "\n\n";
     Table table({"SERVICE", "STATE", "PORT"});
     for (const Json::Value& service : status["services"]) {
-        table.add({textAt(service, "name"), textAt(service, "enabled"), textAt(service, "port")});
+        table.add({textAt(service, "name"), stateOf(service), textAt(service, "port")});
     }
     table.write(session.console.out);
+    writeReasons(session, status["services"]);
 }
 
-struct LogOptions {
-    std::string since;
-    std::string event;
-    std::string actor;
-    std::string before;
-    int limit = defaultPage;
-    bool all = false;
+struct EventOptions {
+    int count = 0;                  ///< 0: no end
+    std::vector<std::string> kinds; ///< empty: all
 };
-
-std::string logPath(const LogOptions& options) {
-    std::string path = "/api/log?limit=" + std::to_string(options.limit);
-    const auto add = [&path](const char* name, const std::string& value) {
-        if (!value.empty()) {
-            path += std::string("&") + name + "=" + percentEncode(value);
-        }
-    };
-    if (!options.since.empty()) {
-        const std::optional<std::string> since = parseSince(options.since, std::time(nullptr));
-        if (!since) {
-            throw Failure(ExitCode::usage, "\"" + options.since + "\" is no point in time.",
-                          "Give a time such as 2026-11-21T08:00:00Z, or an age such as 30m, 2h or 7d.");
-        }
-        add("since", *since);
-    }
-    add("event", options.event);
-    add("actor", options.actor);
-    add("before", options.before);
-    return path;
-}
-
-std::string timeOf(const Json::Value& entry) {
-    const Json::Value& time = entry["time"];
-    return time.isIntegral() ? utcText(static_cast<std::time_t>(time.asInt64())) : displayValue(time);
-}
-
-void writeLog(Session& session, const Json::Value& entries, const Json::Value& next) {
-    if (session.json) {
-        Json::Value result;
-        result["entries"] = entries;
-        result["next"] = next;
-        writeJson(session.console.out, result);
-        return;
-    }
-    Table table({"ID", "TIME", "EVENT", "ACTOR", "ADDRESS", "TEXT"});
-    for (const Json::Value& entry : entries) {
-        table.add({textAt(entry, "id"), timeOf(entry), textAt(entry, "event"), textAt(entry, "actor"),
-                   textAt(entry, "address"), textAt(entry, "text")});
-    }
-    table.write(session.console.out);
-    if (!next.isNull()) {
-        session.console.err << "Older entries: veltctl log --before " << printable(displayValue(next))
-                            << " (with the same filters), or --all\n";
-    }
-}
-
-void showLog(Session& session, LogOptions options) {
-    Json::Value entries(Json::arrayValue);
-    Json::Value next;
-    do {
-        const Json::Value page = session.api.get(logPath(options));
-        for (const Json::Value& entry : page["entries"]) {
-            entries.append(entry);
-        }
-        // A server that names the same page again would be asked for ever.
-        next = displayValue(page["next"]) == options.before ? Json::Value() : page["next"];
-        options.before = displayValue(next);
-    } while (options.all && !next.isNull());
-    writeLog(session, entries, next);
-}
 
 std::string describeEvent(const std::string& event, const Json::Value& data) {
     if (event == "service") {
@@ -132,11 +90,15 @@ void writeEvent(Session& session, const std::string& event, const std::string& t
     session.console.out.flush();
 }
 
-void followEvents(Session& session, int count) {
+void followEvents(Session& session, const EventOptions& options) {
     int seen = 0;
-    const auto enough = [&] { return count > 0 && seen >= count; };
+    const auto enough = [&] { return options.count > 0 && seen >= options.count; };
+    const auto wanted = [&](const std::string& event) {
+        return options.kinds.empty() ||
+               std::find(options.kinds.begin(), options.kinds.end(), event) != options.kinds.end();
+    };
     EventStream stream([&](const std::string& event, const std::string& data) {
-        if (!enough()) {
+        if (!enough() && wanted(event)) {
             writeEvent(session, event, data);
             ++seen;
         }
@@ -155,38 +117,26 @@ void followEvents(Session& session, int count) {
     }
 }
 
-void addLog(CLI::App& app, Command& chosen) {
-    auto options = std::make_shared<LogOptions>();
-    CLI::App* log = app.add_subcommand("log", "Show the administrator log, the newest entries first");
-    log->add_option("--since", options->since, "Entries since a time, or not older than 30m, 2h, 7d")
-        ->type_name("TIME");
-    log->add_option("--event", options->event, "Entries of one event, such as 0x11B00012")
-        ->type_name("EVENT");
-    log->add_option("--actor", options->actor, "Entries of one actor")->type_name("NAME");
-    log->add_option("--before", options->before, "Entries older than the one with this id")->type_name("ID");
-    log->add_option("--limit", options->limit, "Entries per page (default 50)")
-        ->check(CLI::PositiveNumber)
-        ->type_name("N");
-    log->add_flag("--all", options->all, "All pages, not only one");
-    log->callback(
-        [&chosen, options] { chosen = [options](Session& session) { showLog(session, *options); }; });
-}
-
 } // namespace
 
 void addStatusCommands(CLI::App& app, Command& chosen) {
     CLI::App* status = app.add_subcommand("status", "Show which services run, and on which ports");
     status->callback([&chosen] { chosen = showStatus; });
 
-    addLog(app, chosen);
-
-    auto count = std::make_shared<int>(0);
+    auto options = std::make_shared<EventOptions>();
     CLI::App* events = app.add_subcommand("events", "Follow what happens on the server, until interrupted");
-    events->add_option("--count", *count, "End after so many events")
+    events->add_option("--count", options->count, "End after so many events")
         ->check(CLI::PositiveNumber)
         ->type_name("N");
+    events
+        ->add_option("--kind", options->kinds,
+                     "Only events of this kind, or these, separated by commas: service, log, request")
+        ->check(CLI::IsMember({"service", "log", "request"}))
+        ->delimiter(',')
+        ->allow_extra_args(false)
+        ->type_name("KIND");
     events->callback(
-        [&chosen, count] { chosen = [count](Session& session) { followEvents(session, *count); }; });
+        [&chosen, options] { chosen = [options](Session& session) { followEvents(session, *options); }; });
 }
 
 } // namespace velt::cli

@@ -77,7 +77,9 @@ static_assert(offsetof(VELT_FTP_PORT_RANGE, last) == 4, "last");
 int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out);
 
 /// Stores the record, which becomes the service configuration; running daemons take it up at their next
-/// start. Negative on failure, which leaves the stored record as it was.
+/// start. Negative on failure, which leaves the stored record as it was. A platform whose settings are
+/// changed by several callers may store those fields (of service_flags, those bits) alone in which the record
+/// differs from what the calling thread last read or stored, so that what another caller changed since stays.
 int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf);
 
 /// The idle time-out. The platform settles its unit; callers pass it on as it is, a negative one too.
@@ -109,28 +111,30 @@ int VELTFTPUmaskEnabledSet(bool enable);
 /// as it was; callers do not check it.
 int VELTFTPDefaultPassivePortGet(VELT_FTP_PORT_RANGE* out);
 
-/// Fills the list with the names of the shares that the mask `selection` selects (0x207: those offered
-/// to FTP). May replace `*list`; the caller frees what stands there afterwards, also after a failure.
-/// Negative on failure.
+/// Fills the list, which is handed over empty, with the names of the shares that the mask `selection` selects
+/// (0x207: those offered to FTP). May replace `*list`; the caller frees what stands there afterwards, also
+/// after a failure. Negative on failure.
 int VELTFTPShareEnum(VLIBCSzList** list, int selection);
 
-/// Fills the list with the names of the chroot users of `source` (1 local, 2 domain, 8 LDAP, or a union
-/// of these), narrowed to names that contain `substr` and to the domain `domain` where these are not
-/// null. May replace `*list`; the caller frees what stands there afterwards, also after a failure.
-/// Negative on failure.
+/// Fills the list, which is handed over empty, with the names of the chroot users of `source` (1 local, 2
+/// domain, 8 LDAP, or a union of these), narrowed to names that contain `substr`, in whatever letter case,
+/// and to the domain `domain` where these are not null. May replace `*list`; the caller frees what stands
+/// there afterwards, also after a failure. Negative on failure.
 int VELTFTPChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain);
 
 /// The same for the users who are not chroot users.
 int VELTFTPNonChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain);
 
-/// Makes every user named in the list a chroot user. A name may stand there twice. Negative on failure.
+/// Makes every user named in the list a chroot user. A name may stand there twice. Negative on failure, a
+/// name that no user has among them, which leaves all users as they were.
 int VELTFTPAddChrootUser(VLIBCSzList* list);
 
-/// Takes the chroot status from every user named in the list. Negative on failure.
+/// Takes the chroot status from every user named in the list; negative as above.
 int VELTFTPDeleteChrootUser(VLIBCSzList* list);
 
-/// Fills the list with the stored chroot rules, one line each, in stored order. May replace `*list`; the
-/// caller frees what stands there afterwards, also after a failure. Negative on failure.
+/// Fills the list, which is handed over empty, with the stored chroot rules, one line each, in stored order.
+/// May replace `*list`; the caller frees what stands there afterwards, also after a failure. Negative on
+/// failure.
 int VELTFTPChrootRuleEnum(VLIBCSzList** list);
 
 /// Reads one stored rule line: `*isUser` becomes non-zero for a user's rule and 0 for a group's, `name`

@@ -1,14 +1,12 @@
 #include "host/access.h"
 
+#include "host/accounts.h"
 #include "host/problem.h"
 #include "host/random_text.h"
 
-#include <grp.h>
-#include <pwd.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <array>
 #include <cctype>
 #include <utility>
 
@@ -20,26 +18,6 @@ std::string lowered(std::string text) {
     std::transform(text.begin(), text.end(), text.begin(),
                    [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
     return text;
-}
-
-std::string userName(uid_t uid) {
-    std::array<char, 4096> buffer{};
-    passwd record{};
-    passwd* found = nullptr;
-    if (getpwuid_r(uid, &record, buffer.data(), buffer.size(), &found) == 0 && found != nullptr) {
-        return found->pw_name;
-    }
-    return "uid " + std::to_string(uid);
-}
-
-std::optional<gid_t> groupNamed(const std::string& name) {
-    std::array<char, 16384> buffer{};
-    group record{};
-    group* found = nullptr;
-    if (getgrnam_r(name.c_str(), &record, buffer.data(), buffer.size(), &found) == 0 && found != nullptr) {
-        return found->gr_gid;
-    }
-    return std::nullopt;
 }
 
 /// "[::1]:8080" is "::1" and "8080".
@@ -72,6 +50,9 @@ Access::Access(AccessSettings settings, const TokenStore& tokens, HostLog& log)
 std::optional<Refusal> Access::check(const HttpRequest& head, const Peer& peer, Principal& principal) const {
     if (auto refusal = authenticate(head, peer, principal)) {
         return refusal;
+    }
+    if (!head.wellFormed) {
+        return std::nullopt;
     }
     if (!peer.isUnixSocket && !knowsHost(head.host, peer)) {
         return refuse(403, "The Host header names \"" + head.host + "\", which is not this host.", peer,

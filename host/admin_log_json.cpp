@@ -1,8 +1,9 @@
 #include "host/admin_log_json.h"
 
 #include "host/clock.h"
-#include "host/json_text.h"
+#include "host/percent_encoding.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cstdio>
@@ -12,7 +13,7 @@ namespace velt::host {
 
 namespace {
 
-constexpr int maxLimit = 500;
+constexpr int maxLimit = 1000;
 
 std::optional<unsigned> hexDigits(std::string_view text) {
     unsigned value = 0;
@@ -20,22 +21,10 @@ std::optional<unsigned> hexDigits(std::string_view text) {
     return error == std::errc() && stop == text.data() + text.size() ? std::optional(value) : std::nullopt;
 }
 
-/// Nothing when an escape is none, or the text is no UTF-8.
-std::optional<std::string> percentDecoded(const std::string& text) {
-    std::string decoded;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        if (text[i] == '%') {
-            const auto byte = i + 2 < text.size() ? hexDigits(text.substr(i + 1, 2)) : std::nullopt;
-            if (!byte) {
-                return std::nullopt;
-            }
-            decoded += static_cast<char>(*byte);
-            i += 2;
-        } else {
-            decoded += text[i] == '+' ? ' ' : text[i];
-        }
-    }
-    return findInvalidUtf8(decoded) == std::string::npos ? std::optional(decoded) : std::nullopt;
+/// Forms write a blank as "+".
+std::optional<std::string> queryValue(std::string text) {
+    std::replace(text.begin(), text.end(), '+', ' ');
+    return percentDecoded(text);
 }
 
 std::optional<std::int64_t> positiveNumber(const std::string& text) {
@@ -53,6 +42,11 @@ std::optional<std::uint32_t> eventNumber(const std::string& text) {
     const auto number = positiveNumber(text);
     return number && *number <= UINT32_MAX ? std::optional(static_cast<std::uint32_t>(*number))
                                            : std::nullopt;
+}
+
+bool isFilter(const std::string& key) {
+    constexpr std::array<const char*, 5> filters{"since", "event", "actor", "before", "limit"};
+    return std::find(filters.begin(), filters.end(), key) != filters.end();
 }
 
 /// Takes over one filter; returns what its value must be when it is not that, "" when all is well.
@@ -102,22 +96,21 @@ Json::Value toObject(const AdminLogEntry& entry) {
     return object;
 }
 
-std::optional<AdminLogQuery> parseLogQuery(const std::string& query, std::string& error) {
+std::optional<AdminLogQuery> parseLogQuery(const std::string& query, FieldError& error) {
     AdminLogQuery parsed;
     std::istringstream parts(query);
     for (std::string part; std::getline(parts, part, '&');) {
         const std::size_t equals = part.find('=');
-        const std::string key = part.substr(0, equals);
-        const auto value = percentDecoded(equals == std::string::npos ? "" : part.substr(equals + 1));
+        error.field = part.substr(0, equals);
+        const auto value = queryValue(equals == std::string::npos ? "" : part.substr(equals + 1));
         if (!value) {
-            error = key + ": the value is not encoded as it must be";
+            error.expected = "a percent-encoded value in UTF-8";
             return std::nullopt;
         }
         // An empty filter does not narrow.
-        const std::string expected = value->empty() && !key.empty() ? "" : takeFilter(key, *value, parsed);
-        if (!expected.empty()) {
-            error = key;
-            error += ": expected " + expected;
+        const bool empty = value->empty() && isFilter(error.field);
+        error.expected = empty ? "" : takeFilter(error.field, *value, parsed);
+        if (!error.expected.empty()) {
             return std::nullopt;
         }
     }

@@ -4,8 +4,10 @@
 #include "host/json_text.h"
 #include "host/module_answer.h"
 #include "host/module_call.h"
+#include "host/percent_encoding.h"
 #include "host/problem.h"
 #include "host/random_text.h"
+#include "host/services.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -16,36 +18,35 @@ namespace velt::host {
 
 namespace {
 
+using Path = std::vector<std::string>;
+
+const Path eventsPath{"events"};
+
 struct RowName {
     std::string api;
     int version = 0;
     std::string method;
 };
 
-/// "/api/{name}/v{version}/{method}" in its parts; nothing when the path is none of these.
-std::optional<RowName> parseRowPath(const std::string& path) {
-    constexpr std::string_view prefix = "/api/";
-    if (!path.starts_with(prefix)) {
+/// "api", name, "v" and version, method; nothing when the path is none of these.
+std::optional<RowName> rowNameOf(const Path& path) {
+    if (path.size() != 4 || path[0] != "api") {
         return std::nullopt;
     }
-    const std::size_t first = path.find('/', prefix.size());
-    const std::size_t second = first == std::string::npos ? first : path.find('/', first + 1);
-    if (second == std::string::npos || path.find('/', second + 1) != std::string::npos) {
-        return std::nullopt;
-    }
-    const std::string version = path.substr(first + 1, second - first - 1);
+    const std::string& version = path[2];
     const bool number = version.size() >= 2 && version.size() <= 7 && version[0] == 'v' &&
                         version[1] != '0' && version.find_first_not_of("0123456789", 1) == std::string::npos;
     if (!number) {
         return std::nullopt;
     }
-    return RowName{path.substr(prefix.size(), first - prefix.size()), std::stoi(version.substr(1)),
-                   path.substr(second + 1)};
+    return RowName{path[1], std::stoi(version.substr(1)), path[3]};
 }
 
-bool matches(const std::string& path, const std::string& pattern) {
-    return pattern.ends_with('/') ? path.starts_with(pattern) && path.size() > pattern.size()
-                                  : path == pattern;
+bool matches(const Path& path, const Path& pattern) {
+    return std::equal(path.begin(), path.end(), pattern.begin(), pattern.end(),
+                      [](const std::string& segment, const std::string& wanted) {
+                          return wanted == "*" || segment == wanted;
+                      });
 }
 
 std::string milliseconds(double seconds) {
@@ -93,7 +94,7 @@ std::optional<Refusal> App::checkAccess(const HttpRequest& head, const Peer& pee
 }
 
 bool App::asksForEvents(const HttpRequest& request) const {
-    return request.method == "GET" && request.path() == "/events";
+    return request.method == "GET" && pathSegments(request.path()) == eventsPath;
 }
 
 void App::addEventReader(const std::shared_ptr<EventReader>& reader) {
@@ -109,7 +110,7 @@ HttpResponse App::failure(int status, const std::string& detail) {
 
 void App::handle(HttpRequest request, const Principal& principal, Done done) {
     const auto job =
-        std::make_shared<Job>(Job{std::move(request), principal, nextRequestId(), std::move(done)});
+        std::make_shared<Job>(Job{std::move(request), {}, principal, nextRequestId(), std::move(done)});
     try {
         route(job);
     } catch (const std::exception& error) {
@@ -119,16 +120,21 @@ void App::handle(HttpRequest request, const Principal& principal, Done done) {
 }
 
 void App::route(const JobPointer& job) {
+    auto path = pathSegments(job->request.path());
+    if (!path) {
+        finish(job, problem(400, "The path is not encoded as it must be.", job->id));
+        return;
+    }
+    job->path = std::move(*path);
     if (!routeToEndpoint(job)) {
         routeToRow(job);
     }
 }
 
 bool App::routeToEndpoint(const JobPointer& job) {
-    const std::string path = job->request.path();
     std::string allow;
     for (const Endpoint& endpoint : endpoints()) {
-        if (!matches(path, endpoint.path) || (path.starts_with("/api/") && parseRowPath(path))) {
+        if (!matches(job->path, endpoint.path)) {
             continue;
         }
         if (job->request.method != endpoint.method) {
@@ -142,7 +148,7 @@ bool App::routeToEndpoint(const JobPointer& job) {
         run(job, endpoint.kind, [this, job, answer = endpoint.answer] { return (this->*answer)(*job); });
         return true;
     }
-    if (path == "/events") {
+    if (job->path == eventsPath) {
         allow = "GET";
     }
     if (!allow.empty()) {
@@ -152,7 +158,7 @@ bool App::routeToEndpoint(const JobPointer& job) {
 }
 
 void App::routeToRow(const JobPointer& job) {
-    const auto name = parseRowPath(job->request.path());
+    const auto name = rowNameOf(job->path);
     const Row* const row = name ? table_.find(name->api, name->version, name->method) : nullptr;
     if (row == nullptr) {
         finish(job, problem(404, "Nothing is served at " + job->request.path() + ". GET /api lists the rows.",
@@ -184,10 +190,22 @@ void App::serveRow(const JobPointer& job, const Row& row) {
 }
 
 HttpResponse App::callAndAnswer(const Job& job, const Row& row, const Json::Value& parameters) {
-    const Outcome outcome = callRow(row, parameters, job.principal);
+    // Writes run one at a time, so nothing comes between this look and the change.
+    if (!row.reads() && !revision_.allows(job.request.ifMatch)) {
+        return problem(412, "The settings have changed since they were read. Nothing was changed.", job.id);
+    }
+    Outcome outcome = callRow(row, parameters, job.principal);
+    if (!row.reads() && outcome.kind == Outcome::Kind::success) {
+        // A change that found nothing to do must not hide that an earlier one ended half-way.
+        outcome.down = startWhatIsDown(job.principal);
+    }
     HttpResponse response = answerFor(row, parameters, outcome, openApi_, job.id);
     metrics_.countRequest(row, outcome);
     logOutcome(job, row, outcome, response.status);
+    if (outcome.platform.changed) {
+        revision_.advance();
+    }
+    response.headers.emplace_back("ETag", revision_.tag());
     if (!row.reads() && outcome.platform.changed) {
         Json::Value data(Json::objectValue);
         data["api"] = row.api;
@@ -210,6 +228,9 @@ void App::logOutcome(const Job& job, const Row& row, const Outcome& outcome, int
     if (!outcome.platform.sentence.empty()) {
         log_.write(job.id, "platform: " + outcome.platform.sentence);
     }
+    if (!outcome.down.empty()) {
+        log_.write(job.id, sentenceOf(outcome.down));
+    }
     log_.write(job.id, row.name() + " for " + job.principal.actor + " at " + job.principal.address + ": " +
                            std::to_string(status) + " in " + milliseconds(outcome.seconds));
 }
@@ -219,6 +240,9 @@ void App::run(const JobPointer& job, RequestOrder::Kind kind, std::function<Http
         HttpResponse response;
         try {
             response = answer();
+        } catch (const TokenError& error) {
+            log_.write(job->id, error.what());
+            response = problem(500, error.what(), job->id);
         } catch (const std::exception& error) {
             log_.write(job->id, std::string("internal error: ") + error.what());
             response = problem(500, "The host failed. Its log has more under this request's id.", job->id);

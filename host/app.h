@@ -10,6 +10,7 @@
 #include "host/module_table.h"
 #include "host/openapi.h"
 #include "host/request_order.h"
+#include "host/revision.h"
 #include "host/token_store.h"
 
 #include <chrono>
@@ -46,6 +47,7 @@ private:
     /// A request on its way.
     struct Job {
         HttpRequest request;
+        std::vector<std::string> path; ///< its segments
         Principal principal;
         std::string id;
         Done done;
@@ -55,7 +57,7 @@ private:
     /// One of the host's own endpoints.
     struct Endpoint {
         const char* method;
-        const char* path; ///< what ends in "/" stands for all paths below
+        std::vector<std::string> path; ///< its segments; "*" stands for any one
         bool adminOnly;
         RequestOrder::Kind kind;
         HttpResponse (App::*answer)(const Job& job);
@@ -83,9 +85,6 @@ private:
     HttpResponse createToken(const Job& job);
     HttpResponse deleteToken(const Job& job);
 
-    /// {"name", "enabled", "port"} of each service, from the modules' own answers.
-    Json::Value services(const Principal& principal);
-
     const ModuleTable& table_;
     HostLog& log_;
     const std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
@@ -94,6 +93,7 @@ private:
     OpenApi openApi_;
     Metrics metrics_;
     EventHub events_;
+    Revision revision_;
     RequestOrder order_; // the last, so that its threads end before what they use
 };
 

@@ -3,8 +3,8 @@
 #include "host/admin_log_json.h"
 #include "host/app.h"
 #include "host/json_text.h"
-#include "host/module_call.h"
 #include "host/problem.h"
+#include "host/services.h"
 
 #include <utility>
 
@@ -12,17 +12,7 @@ namespace velt::host {
 
 namespace {
 
-constexpr const char* ftpApi = "VELT.Core.FileServ.FTP";
-constexpr const char* sftpApi = "VELT.Core.FileServ.FTP.SFTP";
 constexpr std::size_t maxTokenName = 64;
-
-Json::Value service(const char* name, const Json::Value& enabled, const Json::Value& port) {
-    Json::Value object(Json::objectValue);
-    object["name"] = name;
-    object["enabled"] = enabled;
-    object["port"] = port;
-    return object;
-}
 
 Json::Value toObject(const Token& token) {
     Json::Value object(Json::objectValue);
@@ -43,14 +33,19 @@ bool isTokenName(const std::string& name) {
     return !name.empty() && name.size() <= maxTokenName;
 }
 
-HttpResponse badToken(const std::string& field, const std::string& expected, const std::string& requestId) {
-    Json::Value members(Json::objectValue);
-    members["detail"] = field + ": expected " + expected + ". No token was made.";
-    Json::Value error(Json::objectValue);
-    error["field"] = field;
-    error["expected"] = expected;
-    members["errors"].append(error);
-    return problemWith(422, std::move(members), requestId);
+constexpr const char* noTokenMade = " No token was made.";
+
+using LogEntries = std::vector<AdminLogEntry>;
+
+/// The next entry after a page, if there is one. Nothing, with the reason in `error`, when that cannot be
+/// read.
+std::optional<LogEntries> entriesAfter(const LogEntries& page, AdminLogQuery query, std::string& error) {
+    if (page.size() < static_cast<std::size_t>(query.limit)) {
+        return LogEntries{};
+    }
+    query.beforeId = page.back().id;
+    query.limit = 1;
+    return queryAdminLog(query, error);
 }
 
 } // namespace
@@ -58,15 +53,15 @@ HttpResponse badToken(const std::string& field, const std::string& expected, con
 const std::vector<App::Endpoint>& App::endpoints() {
     using Kind = RequestOrder::Kind;
     static const std::vector<Endpoint> all{
-        {"GET", "/api", false, Kind::unordered, &App::listRows},
-        {"GET", "/healthz", false, Kind::unordered, &App::health},
-        {"GET", "/openapi.json", false, Kind::unordered, &App::openApi},
-        {"GET", "/metrics", false, Kind::read, &App::metrics},
-        {"GET", "/api/status", false, Kind::read, &App::status},
-        {"GET", "/api/log", false, Kind::unordered, &App::adminLog},
-        {"GET", "/api/tokens", true, Kind::unordered, &App::listTokens},
-        {"POST", "/api/tokens", true, Kind::unordered, &App::createToken},
-        {"DELETE", "/api/tokens/", true, Kind::unordered, &App::deleteToken},
+        {"GET", {"api"}, false, Kind::unordered, &App::listRows},
+        {"GET", {"healthz"}, false, Kind::unordered, &App::health},
+        {"GET", {"openapi.json"}, false, Kind::unordered, &App::openApi},
+        {"GET", {"metrics"}, false, Kind::read, &App::metrics},
+        {"GET", {"api", "status"}, false, Kind::read, &App::status},
+        {"GET", {"api", "log"}, false, Kind::unordered, &App::adminLog},
+        {"GET", {"api", "tokens"}, true, Kind::unordered, &App::listTokens},
+        {"POST", {"api", "tokens"}, true, Kind::unordered, &App::createToken},
+        {"DELETE", {"api", "tokens", "*"}, true, Kind::unordered, &App::deleteToken},
     };
     return all;
 }
@@ -87,7 +82,11 @@ HttpResponse App::listRows(const Job&) {
 
 HttpResponse App::health(const Job&) {
     Json::Value value(Json::objectValue);
-    value["status"] = "ok";
+    const std::vector<ServiceDown> down = servicesDown();
+    value["status"] = down.empty() ? "ok" : "degraded";
+    for (const ServiceDown& each : down) {
+        value["down"].append(toObject(each));
+    }
     return jsonResponse(200, value);
 }
 
@@ -96,29 +95,14 @@ HttpResponse App::openApi(const Job&) {
 }
 
 HttpResponse App::metrics(const Job& job) {
-    for (const Json::Value& each : services(job.principal)) {
-        metrics_.setServiceUp(each["name"].asString(), each["enabled"].asBool());
+    for (const Service& each : listServices(table_, job.principal)) {
+        metrics_.setService(each.name, each.wanted.value_or(true), each.running);
     }
+    for (const auto& [daemon, restarts] : daemonRestarts()) {
+        metrics_.setDaemonRestarts(daemon, restarts);
+    }
+    metrics_.setEventReaders(events_.readers());
     return {200, "text/plain; version=0.0.4; charset=utf-8", metrics_.text(), {}};
-}
-
-Json::Value App::services(const Principal& principal) {
-    Json::Value list(Json::arrayValue);
-    const Json::Value none(Json::objectValue);
-    if (const Row* const row = table_.find(ftpApi, 3, "get")) {
-        const Outcome ftp = callRow(*row, none, principal);
-        if (ftp.kind == Outcome::Kind::success) {
-            list.append(service("ftp", ftp.data["enable_ftp"], ftp.data["portnum"]));
-            list.append(service("ftps", ftp.data["enable_ftps"], ftp.data["portnum"]));
-        }
-    }
-    if (const Row* const row = table_.find(sftpApi, 1, "get")) {
-        const Outcome sftp = callRow(*row, none, principal);
-        if (sftp.kind == Outcome::Kind::success) {
-            list.append(service("sftp", sftp.data["enable"], sftp.data["portnum"]));
-        }
-    }
-    return list;
 }
 
 HttpResponse App::status(const Job& job) {
@@ -126,30 +110,29 @@ HttpResponse App::status(const Job& job) {
     value["version"] = VELT_VERSION;
     const auto uptime = std::chrono::steady_clock::now() - start_;
     value["uptime_seconds"] = Json::Int64{std::chrono::duration_cast<std::chrono::seconds>(uptime).count()};
-    value["services"] = services(job.principal);
+    value["services"] = Json::Value(Json::arrayValue);
+    for (const Service& each : listServices(table_, job.principal)) {
+        value["services"].append(toObject(each));
+    }
     return jsonResponse(200, value);
 }
 
 HttpResponse App::adminLog(const Job& job) {
-    std::string error;
-    auto query = parseLogQuery(job.request.query(), error);
+    FieldError wrong;
+    auto query = parseLogQuery(job.request.query(), wrong);
     if (!query) {
-        return problem(400, error + ".", job.id);
+        return fieldProblem(400, wrong, "", job.id);
     }
-    // One entry more than the page holds tells whether there is another page.
-    const auto limit = static_cast<std::size_t>(query->limit++);
-    auto entries = queryAdminLog(*query, error);
-    if (!entries) {
+    std::string error;
+    const auto page = queryAdminLog(*query, error);
+    const auto rest = page ? entriesAfter(*page, *query, error) : std::nullopt;
+    if (!rest) {
         return problem(500, error, job.id);
     }
     Json::Value value(Json::objectValue);
-    value["next"] = Json::Value();
-    if (entries->size() > limit) {
-        entries->resize(limit);
-        value["next"] = Json::Int64{entries->back().id};
-    }
+    value["next"] = rest->empty() ? Json::Value() : Json::Value(Json::Int64{page->back().id});
     value["entries"] = Json::Value(Json::arrayValue);
-    for (const AdminLogEntry& entry : *entries) {
+    for (const AdminLogEntry& entry : *page) {
         value["entries"].append(toObject(entry));
     }
     return jsonResponse(200, value);
@@ -167,16 +150,17 @@ HttpResponse App::listTokens(const Job&) {
 HttpResponse App::createToken(const Job& job) {
     const ParsedObject parsed = parseObject(job.request.body);
     if (!parsed.error.empty()) {
-        return problem(400, "The body is no JSON object: " + parsed.error + ".", job.id);
+        return problem(400, "The body is no JSON object: " + parsed.error + "." + noTokenMade, job.id);
     }
     const Json::Value& name = parsed.value["name"];
     const Json::Value& role = parsed.value["role"];
     if (!name.isString() || !isTokenName(name.asString())) {
-        return badToken("name", "a text of 1 to 64 bytes without control characters", job.id);
+        return fieldProblem(422, {"name", "a text of 1 to 64 bytes without control characters"}, noTokenMade,
+                            job.id);
     }
     const auto known = role.isString() ? roleNamed(role.asString()) : std::nullopt;
     if (!known) {
-        return badToken("role", "\"admin\" or \"viewer\"", job.id);
+        return fieldProblem(422, {"role", "\"admin\" or \"viewer\""}, noTokenMade, job.id);
     }
     Token created;
     const std::string token = tokens_.create(name.asString(), *known, created);
@@ -189,8 +173,7 @@ HttpResponse App::createToken(const Job& job) {
 }
 
 HttpResponse App::deleteToken(const Job& job) {
-    const std::string path = job.request.path();
-    const std::string id = path.substr(path.rfind('/') + 1);
+    const std::string& id = job.path.back();
     if (!tokens_.remove(id)) {
         return problem(404, "There is no token with the id " + id + ".", job.id);
     }

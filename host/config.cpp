@@ -1,147 +1,196 @@
 #include "host/config.h"
 
+#include "host/file_text.h"
 #include "host/json_text.h"
 
+#include <algorithm>
+#include <cerrno>
 #include <charconv>
-#include <fstream>
 #include <functional>
-#include <iterator>
 #include <map>
+#include <system_error>
 
 namespace velt::host {
 
 namespace {
 
-using Setter = std::function<void(Config&, const std::string& value)>;
+/// What a setting takes instead of the value that it was given.
+struct BadValue {
+    std::string expected;
+};
+
+enum class Form {
+    flag,   ///< nothing on the command line, true or false in the file
+    number, ///< a whole number
+    text,
+    list, ///< of texts
+};
 
 /// A setting, named as on the command line without the dashes.
 struct Setting {
-    bool takesValue;
-    Setter set;
+    Form form;
+    std::function<void(Config&, const std::string& value)> set; ///< throws BadValue
 };
 
-std::size_t number(const std::string& name, const std::string& text, std::size_t least) {
+struct Range {
+    std::size_t least;
+    std::size_t most;
+};
+
+constexpr Range headBytes{1024, std::size_t{1} << 20U};
+constexpr Range bodyBytes{1024, std::size_t{1} << 30U};
+constexpr Range connectionCount{1, 100'000};
+constexpr Range someSeconds{1, 86'400};
+constexpr Range noneOrSomeSeconds{0, 86'400};
+constexpr Range ioThreadCount{1, 64};
+constexpr Range workerCount{1, 256};
+
+std::size_t number(const std::string& text, Range range) {
     std::size_t value = 0;
     const char* const end = text.data() + text.size();
     const auto [stop, error] = std::from_chars(text.data(), end, value);
-    constexpr std::size_t most = 1'000'000'000;
-    if (error != std::errc() || stop != end || value < least || value > most) {
-        throw ConfigError("--" + name + " needs a whole number of at least " + std::to_string(least) +
-                          ", not \"" + text + "\".");
+    if (error != std::errc() || stop != end || value < range.least || value > range.most) {
+        throw BadValue{"a whole number from " + std::to_string(range.least) + " to " +
+                       std::to_string(range.most)};
     }
     return value;
 }
 
-Setting limit(const std::string& name, std::size_t HttpLimits::*member, std::size_t least) {
-    return {true, [=](Config& config, const std::string& value) {
-                config.limits.*member = number(name, value, least);
+const std::string& notEmpty(const std::string& text) {
+    if (text.empty()) {
+        throw BadValue{"a text that is not empty"};
+    }
+    return text;
+}
+
+Setting limit(std::size_t HttpLimits::*member, Range range) {
+    return {Form::number,
+            [=](Config& config, const std::string& value) { config.limits.*member = number(value, range); }};
+}
+
+Setting seconds(std::chrono::milliseconds HttpLimits::*member) {
+    return {Form::number, [=](Config& config, const std::string& value) {
+                config.limits.*member = std::chrono::seconds(number(value, someSeconds));
             }};
 }
 
-Setting seconds(const std::string& name, std::chrono::milliseconds HttpLimits::*member) {
-    return {true, [=](Config& config, const std::string& value) {
-                config.limits.*member = std::chrono::seconds(number(name, value, 1));
-            }};
-}
-
-Setting threads(const std::string& name, unsigned Config::*member) {
-    return {true, [=](Config& config, const std::string& value) {
-                config.*member = static_cast<unsigned>(number(name, value, 1));
+Setting threads(unsigned Config::*member, Range range) {
+    return {Form::number, [=](Config& config, const std::string& value) {
+                config.*member = static_cast<unsigned>(number(value, range));
             }};
 }
 
 Setting flag(bool Config::*member) {
-    return {false, [=](Config& config, const std::string&) { config.*member = true; }};
+    return {Form::flag, [=](Config& config, const std::string&) { config.*member = true; }};
 }
 
-template<class Member> Setting place(Member Config::*member) {
-    return {true, [=](Config& config, const std::string& value) { config.*member = value; }};
+template<class Member> Setting text(Member Config::*member) {
+    return {Form::text, [=](Config& config, const std::string& value) { config.*member = notEmpty(value); }};
+}
+
+Setting tlsFile(std::filesystem::path TlsFiles::*member) {
+    return {Form::text,
+            [=](Config& config, const std::string& value) { config.tls.*member = notEmpty(value); }};
 }
 
 template<class List> Setting list(List Config::*member) {
-    return {true, [=](Config& config, const std::string& value) { (config.*member).emplace_back(value); }};
-}
-
-std::map<std::string, Setting> limitSettings() {
-    return {
-        {"max-head", limit("max-head", &HttpLimits::head, 1024)},
-        {"max-body", limit("max-body", &HttpLimits::body, 1024)},
-        {"max-connections", limit("max-connections", &HttpLimits::connections, 1)},
-        {"head-seconds", seconds("head-seconds", &HttpLimits::headTime)},
-        {"body-seconds", seconds("body-seconds", &HttpLimits::bodyTime)},
-        {"idle-seconds", seconds("idle-seconds", &HttpLimits::idleTime)},
-        {"write-seconds", seconds("write-seconds", &HttpLimits::writeTime)},
-        {"io-threads", threads("io-threads", &Config::ioThreads)},
-        {"workers", threads("workers", &Config::workers)},
-        {"stop-seconds",
-         {true,
-          [](Config& config, const std::string& value) {
-              config.stopTime = std::chrono::seconds(number("stop-seconds", value, 0));
-          }}},
-    };
+    return {Form::list, [=](Config& config, const std::string& value) {
+                (config.*member).emplace_back(notEmpty(value));
+            }};
 }
 
 std::map<std::string, Setting> allSettings() {
-    std::map<std::string, Setting> settings = limitSettings();
-    settings.insert({
-        {"state-root", place(&Config::stateRoot)},
-        {"module", list(&Config::modules)},
-        {"socket", place(&Config::socket)},
-        {"listen", list(&Config::listen)},
-        {"host-name", list(&Config::hostNames)},
-        {"admin-group", place(&Config::adminGroup)},
+    return {
+        {"admin-group", text(&Config::adminGroup)},
         {"allow-remote", flag(&Config::allowRemote)},
+        {"body-seconds", seconds(&HttpLimits::bodyTime)},
+        {"head-seconds", seconds(&HttpLimits::headTime)},
+        {"host-name", list(&Config::hostNames)},
+        {"idle-seconds", seconds(&HttpLimits::idleTime)},
+        {"io-threads", threads(&Config::ioThreads, ioThreadCount)},
+        {"listen", list(&Config::listen)},
+        {"max-body", limit(&HttpLimits::body, bodyBytes)},
+        {"max-connections", limit(&HttpLimits::connections, connectionCount)},
+        {"max-head", limit(&HttpLimits::head, headBytes)},
+        {"module", list(&Config::modules)},
         {"print-ready", flag(&Config::printReady)},
-        {"help", flag(&Config::help)},
-        {"version", flag(&Config::version)},
-        {"tls-certificate",
-         {true, [](Config& config, const std::string& value) { config.tls.certificate = value; }}},
-        {"tls-key", {true, [](Config& config, const std::string& value) { config.tls.key = value; }}},
-    });
-    return settings;
+        {"socket", text(&Config::socket)},
+        {"state-root", text(&Config::stateRoot)},
+        {"stop-seconds",
+         {Form::number,
+          [](Config& config, const std::string& value) {
+              config.stopTime = std::chrono::seconds(number(value, noneOrSomeSeconds));
+          }}},
+        {"tls-certificate", tlsFile(&TlsFiles::certificate)},
+        {"tls-key", tlsFile(&TlsFiles::key)},
+        {"workers", threads(&Config::workers, workerCount)},
+        {"write-seconds", seconds(&HttpLimits::writeTime)},
+    };
 }
 
-const Setting& settingNamed(const std::string& name) {
+/// Null when there is no such setting.
+const Setting* settingNamed(const std::string& name) {
     static const std::map<std::string, Setting> settings = allSettings();
     const auto found = settings.find(name);
-    if (found == settings.end()) {
-        throw ConfigError("There is no setting \"" + name + "\". --help lists them.");
-    }
-    return found->second;
+    return found == settings.end() ? nullptr : &found->second;
 }
 
-void apply(Config& config, const std::string& name, const Json::Value& value) {
-    const Setting& setting = settingNamed(name);
-    if (value.isArray()) {
-        for (const Json::Value& each : value) {
-            apply(config, name, each);
+/// The values as on the command line. Throws BadValue when the value is not of the setting's form.
+std::vector<std::string> valuesOf(const Json::Value& value, Form form) {
+    switch (form) {
+    case Form::flag:
+        if (!value.isBool()) {
+            throw BadValue{"true or false"};
         }
-    } else if (setting.takesValue) {
-        if (!value.isString() && !value.isIntegral()) {
-            throw ConfigError("\"" + name + "\" in the configuration file needs a text or a number.");
+        return value.asBool() ? std::vector<std::string>{""} : std::vector<std::string>{};
+    case Form::number:
+        // Whatever is no whole number is told by the setting, which knows its range.
+        return {value.isIntegral() ? value.asString() : ""};
+    case Form::text:
+        if (!value.isString()) {
+            throw BadValue{"a text"};
         }
-        setting.set(config, value.asString());
-    } else if (value.isBool()) {
-        if (value.asBool()) {
-            setting.set(config, "");
-        }
-    } else {
-        throw ConfigError("\"" + name + "\" in the configuration file is true or false.");
+        return {value.asString()};
+    case Form::list:
+        break;
     }
+    std::vector<std::string> texts;
+    for (const Json::Value& each : value.isArray() ? value : Json::Value(Json::arrayValue)) {
+        if (each.isString()) {
+            texts.push_back(each.asString());
+        }
+    }
+    if (!value.isArray() || texts.size() != value.size()) {
+        throw BadValue{"a list of texts"};
+    }
+    return texts;
 }
 
 void readFile(Config& config, const std::string& file) {
-    std::ifstream stream(file);
-    const std::string text{std::istreambuf_iterator<char>(stream), {}};
-    if (!stream.is_open()) {
-        throw ConfigError("The configuration file " + file + " cannot be read.");
+    const auto content = readFileText(file);
+    if (!content) {
+        throw ConfigError("The configuration file " + file +
+                          " cannot be read: " + std::generic_category().message(errno) + ".");
     }
-    const ParsedObject parsed = parseObject(text);
+    const ParsedObject parsed = parseObject(*content);
     if (!parsed.error.empty()) {
         throw ConfigError("The configuration file " + file + " is no JSON object: " + parsed.error + ".");
     }
     for (const std::string& name : parsed.value.getMemberNames()) {
-        apply(config, name, parsed.value[name]);
+        std::string place = "The configuration file " + file;
+        place.append(": \"").append(name).append("\"");
+        const Setting* const setting = settingNamed(name);
+        if (setting == nullptr) {
+            throw ConfigError(place + " is no setting. --help lists them.");
+        }
+        const Json::Value& value = parsed.value[name];
+        try {
+            for (const std::string& each : valuesOf(value, setting->form)) {
+                setting->set(config, each);
+            }
+        } catch (const BadValue& bad) {
+            throw ConfigError(place + " takes " + bad.expected + ", not " + toJson(value) + ".");
+        }
     }
 }
 
@@ -172,6 +221,38 @@ void check(const Config& config) {
     }
 }
 
+/// An option of the command line.
+struct Word {
+    std::string name;
+    std::string value;
+};
+
+/// Takes the words apart, and notes those that are questions.
+std::vector<Word> readWords(const std::vector<std::string>& words, Config& config) {
+    std::vector<Word> given;
+    for (std::size_t i = 0; i < words.size(); ++i) {
+        const std::size_t equals = words[i].find('=');
+        const bool hasValue = equals != std::string::npos;
+        const std::string name = words[i].substr(0, equals).substr(std::min<std::size_t>(2, words[i].size()));
+        const Setting* const setting = settingNamed(name);
+        const bool question = name == "help" || name == "version";
+        if (!words[i].starts_with("--") || (setting == nullptr && name != "config" && !question)) {
+            throw ConfigError("\"" + words[i] + "\" is no option. --help lists them.");
+        }
+        config.help = config.help || name == "help";
+        config.version = config.version || name == "version";
+        const bool takesValue = !question && (setting == nullptr || setting->form != Form::flag);
+        if (hasValue && !takesValue) {
+            throw ConfigError("--" + name + " takes no value.");
+        }
+        if (takesValue && !hasValue && ++i == words.size()) {
+            throw ConfigError("--" + name + " needs a value.");
+        }
+        given.push_back({name, hasValue ? words[i].substr(equals + 1) : (takesValue ? words[i] : "")});
+    }
+    return given;
+}
+
 } // namespace
 
 std::filesystem::path Config::socketPath() const {
@@ -184,31 +265,24 @@ std::filesystem::path Config::tokenFile() const {
 
 Config readConfig(const std::vector<std::string>& words) {
     Config config;
-    std::vector<std::pair<std::string, std::string>> given;
-    for (std::size_t i = 0; i < words.size(); ++i) {
-        if (!words[i].starts_with("--")) {
-            throw ConfigError("\"" + words[i] + "\" is no option. --help lists them.");
+    const std::vector<Word> given = readWords(words, config);
+    for (const Word& word : given) {
+        if (word.name == "config") {
+            readFile(config, word.value);
         }
-        const std::size_t equals = words[i].find('=');
-        const std::string name = words[i].substr(2, equals == std::string::npos ? equals : equals - 2);
-        std::string value;
-        if (name == "config" || settingNamed(name).takesValue) {
-            if (equals == std::string::npos && ++i == words.size()) {
-                throw ConfigError("--" + name + " needs a value.");
+    }
+    for (const Word& word : given) {
+        forgetLists(config, word.name);
+    }
+    for (const Word& word : given) {
+        const Setting* const setting = settingNamed(word.name);
+        try {
+            if (setting != nullptr) {
+                setting->set(config, word.value);
             }
-            value = equals == std::string::npos ? words[i] : words[i].substr(equals + 1);
+        } catch (const BadValue& bad) {
+            throw ConfigError("--" + word.name + " takes " + bad.expected + ", not \"" + word.value + "\".");
         }
-        if (name == "config") {
-            readFile(config, value);
-        } else {
-            given.emplace_back(name, value);
-        }
-    }
-    for (const auto& [name, value] : given) {
-        forgetLists(config, name);
-    }
-    for (const auto& [name, value] : given) {
-        settingNamed(name).set(config, value);
     }
     check(config);
     return config;
@@ -217,7 +291,9 @@ Config readConfig(const std::vector<std::string>& words) {
 const char* usage() {
     return "Usage: veltd --module FILE [OPTION]...\n"
            "Serves the modules' APIs over HTTP.\n\n"
-           "  --config FILE            read settings from a JSON object, named as the options here\n"
+           "  --config FILE            read settings from a file: a JSON object whose keys are options of "
+           "here,\n"
+           "                           the command line goes before it\n"
            "  --module FILE            load this module; may be given several times\n"
            "  --state-root DIR         where all state lies (/)\n"
            "  --socket PATH            the Unix socket (run/velt/veltd.sock below the state root)\n"

@@ -38,8 +38,8 @@ struct Config {
     std::filesystem::path tokenFile() const;
 };
 
-/// Reads the words after the program's name. A configuration file's settings come before those of the command
-/// line. Throws ConfigError.
+/// Reads the words after the program's name. A setting of the command line, also a list, replaces that of a
+/// configuration file. Throws ConfigError, which names the option or key and what it takes.
 Config readConfig(const std::vector<std::string>& words);
 
 /// What --help prints.

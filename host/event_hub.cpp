@@ -6,7 +6,19 @@ namespace velt::host {
 
 void EventHub::add(const std::shared_ptr<EventReader>& reader) {
     const std::lock_guard lock(mutex_);
+    // Readers may come and go for a long time before there is an event.
+    forgetThoseThatLeft();
     readers_.push_back(reader);
+}
+
+std::size_t EventHub::readers() {
+    const std::lock_guard lock(mutex_);
+    forgetThoseThatLeft();
+    return readers_.size();
+}
+
+void EventHub::forgetThoseThatLeft() {
+    std::erase_if(readers_, [](const std::weak_ptr<EventReader>& each) { return each.expired(); });
 }
 
 void EventHub::publish(const std::string& type, const Json::Value& data) {
@@ -14,13 +26,11 @@ void EventHub::publish(const std::string& type, const Json::Value& data) {
     const auto event =
         std::make_shared<const std::string>("event: " + type + "\ndata: " + toJson(data) + "\n\n");
     const std::lock_guard lock(mutex_);
-    std::erase_if(readers_, [&event](const std::weak_ptr<EventReader>& each) {
-        const auto reader = each.lock();
-        if (reader != nullptr) {
+    for (const std::weak_ptr<EventReader>& each : readers_) {
+        if (const auto reader = each.lock()) {
             reader->deliver(event);
         }
-        return reader == nullptr;
-    });
+    }
 }
 
 } // namespace velt::host

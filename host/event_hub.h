@@ -6,6 +6,7 @@
 
 #include <json/value.h>
 
+#include <cstddef>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -19,10 +20,15 @@ public:
     /// The hub forgets a reader that nobody else holds any more.
     void add(const std::shared_ptr<EventReader>& reader);
 
+    /// Those that still read.
+    std::size_t readers();
+
     /// Sends {event: type, data: data} to all readers. Does not block.
     void publish(const std::string& type, const Json::Value& data);
 
 private:
+    void forgetThoseThatLeft();
+
     std::mutex mutex_;
     std::vector<std::weak_ptr<EventReader>> readers_;
 };

@@ -88,6 +88,19 @@ ParsedObject parseText(std::string_view text) {
     return parsed;
 }
 
+/// Bytes that are no UTF-8 stand inside of strings, where any character may stand for them.
+std::string repaired(const std::string& text) {
+    constexpr std::string_view replacement = "\xEF\xBF\xBD";
+    std::string good;
+    std::string_view rest = text;
+    for (std::size_t bad = findInvalidUtf8(rest); bad != std::string_view::npos;
+         bad = findInvalidUtf8(rest)) {
+        good.append(rest.substr(0, bad)).append(replacement);
+        rest.remove_prefix(bad + 1);
+    }
+    return good.append(rest);
+}
+
 } // namespace
 
 std::size_t findInvalidUtf8(std::string_view text) {
@@ -122,9 +135,10 @@ ParsedObject parseObject(std::string_view text) {
 
 std::string toJson(const Json::Value& value) {
     thread_local const std::unique_ptr<Json::StreamWriter> writer = makeWriter();
-    std::ostringstream text;
-    writer->write(value, &text);
-    return std::move(text).str();
+    std::ostringstream stream;
+    writer->write(value, &stream);
+    std::string text = std::move(stream).str();
+    return findInvalidUtf8(text) == std::string_view::npos ? text : repaired(text);
 }
 
 } // namespace velt::host

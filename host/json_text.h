@@ -18,7 +18,8 @@ struct ParsedObject {
 /// Reads one JSON object: UTF-8, no comments, no key twice. Text of blanks alone is the empty object.
 ParsedObject parseObject(std::string_view text);
 
-/// Compact JSON in one line, UTF-8 as it is.
+/// Compact JSON in one line, UTF-8 as it is. A byte that is no UTF-8, such as one of a file's name, becomes
+/// the replacement character.
 std::string toJson(const Json::Value& value);
 
 /// The offset of the first byte that is no UTF-8, or npos.

@@ -2,6 +2,7 @@
 
 #include "host/app.h"
 #include "host/config.h"
+#include "host/descriptors.h"
 #include "host/host_log.h"
 #include "host/http/server.h"
 #include "host/json_text.h"
@@ -20,6 +21,7 @@ using velt::host::App;
 using velt::host::AppSettings;
 using velt::host::Config;
 using velt::host::HostLog;
+using velt::host::HttpLimits;
 using velt::host::HttpServer;
 using velt::host::Listener;
 
@@ -39,7 +41,7 @@ sigset_t blockEndSignals() {
 
 /// Adds all listening sockets and returns the line for --print-ready.
 Json::Value listenEverywhere(const Config& config, HttpServer& server, HostLog& log) {
-    std::vector<Listener> listeners = Listener::inherited();
+    std::vector<Listener> listeners = Listener::inherited(config.allowRemote);
     if (listeners.empty()) {
         listeners.push_back(Listener::unixSocket(config.socketPath(), config.adminGroup));
     }
@@ -60,6 +62,17 @@ Json::Value listenEverywhere(const Config& config, HttpServer& server, HostLog& 
     return ready;
 }
 
+/// The configured limits, with as many connections as the process may have.
+HttpLimits possibleLimits(const Config& config, HostLog& log) {
+    HttpLimits limits = config.limits;
+    limits.connections = velt::host::makeRoomForConnections(limits.connections);
+    if (limits.connections < config.limits.connections) {
+        log.write("the limit of open files allows only " + std::to_string(limits.connections) +
+                  " connections");
+    }
+    return limits;
+}
+
 void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     std::string error;
     if (!velt::host::openPlatform(config.stateRoot, error)) {
@@ -74,7 +87,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     settings.tokenFile = config.tokenFile();
     settings.workers = config.workers;
     App app(settings, table, log);
-    HttpServer server(app, config.limits, config.tls);
+    HttpServer server(app, possibleLimits(config, log), config.tls);
     const Json::Value ready = listenEverywhere(config, server, log);
     if (!velt::host::startEnabledServices(error)) {
         log.write("not every enabled service started: " + error);

@@ -1,9 +1,12 @@
-// What /metrics shows: requests and their durations by row and outcome, services up, daemon starts.
+// What /metrics shows: requests and their durations by row and outcome, services up, daemon starts and
+// restarts.
 #ifndef VELT_HOST_METRICS_H
 #define VELT_HOST_METRICS_H
 
 #include "host/module_call.h"
 
+#include <cstddef>
+#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -17,14 +20,22 @@ public:
     Metrics(const Metrics&) = delete;
     Metrics& operator=(const Metrics&) = delete;
 
-    /// Counts a served request under "success", the module's code, or "defect".
+    /// Counts a served request under "success", the module's code, "service_down" or "defect".
     void countRequest(const Row& row, const Outcome& outcome);
 
     /// Counts an answer that no module had a part in, by its status.
     void countRefusal(int status);
 
-    void setServiceUp(const std::string& service, bool up);
+    void setService(const std::string& service, bool wanted, bool running);
+
+    /// Counts a start that was asked for.
     void countDaemonStart(const std::string& service);
+
+    /// Takes over how often a daemon was started again after it had ended by itself, as counted elsewhere:
+    /// from 0 since some earlier moment.
+    void setDaemonRestarts(const std::string& daemon, std::uint64_t count);
+
+    void setEventReaders(std::size_t count);
 
     /// The text format of Prometheus.
     std::string text() const;

@@ -2,6 +2,7 @@
 
 #include "host/module_log.h"
 #include "host/problem.h"
+#include "host/services.h"
 
 #include <algorithm>
 #include <array>
@@ -14,20 +15,19 @@ struct Meaning {
     int code;
     int status;
     const char* title;
-    bool beforeAnyChange; ///< the module refuses with it before it touches anything
     bool portTaken;
 };
 
 constexpr int badParameter = 1901;
-constexpr Meaning otherFailure{0, 500, "The operation failed", false, false};
+constexpr Meaning otherFailure{0, 500, "The operation failed", false};
 
 constexpr std::array<Meaning, 6> meanings{{
-    {badParameter, 422, "A parameter is not acceptable", true, false},
-    {1902, 500, "The operation failed", false, false},
-    {1903, 409, "The FTP port is taken", true, true},
-    {1904, 409, "The passive port range is taken", true, true},
-    {1905, 409, "The share cannot be reached over FTP", true, false},
-    {1951, 409, "The SFTP port is taken", true, true},
+    {badParameter, 422, "A parameter is not acceptable", false},
+    {1902, 500, "The operation failed", false},
+    {1903, 409, "The FTP port is taken", true},
+    {1904, 409, "The passive port range is taken", true},
+    {1905, 409, "The share cannot be reached over FTP", false},
+    {1951, 409, "The SFTP port is taken", true},
 }};
 
 const Meaning& meaningOf(int code) {
@@ -50,7 +50,19 @@ std::string sentenceOf(const FieldError& error) {
     return error.field + ": expected " + error.expected + ".";
 }
 
-std::string detailOf(const Outcome& outcome, const Meaning& meaning, const std::vector<FieldError>& errors) {
+/// How far a change got that the module has refused.
+std::string extentOf(const PlatformReport& platform) {
+    if (!platform.changed) {
+        return "Nothing was changed.";
+    }
+    if (!platform.stored) {
+        return "";
+    }
+    return platform.storeFailed ? "Some of the new settings are stored." : "The new settings are stored.";
+}
+
+std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& meaning,
+                     const std::vector<FieldError>& errors) {
     std::string detail;
     append(detail, reasonIn(outcome.logLines));
     for (const FieldError& error : errors) {
@@ -59,32 +71,45 @@ std::string detailOf(const Outcome& outcome, const Meaning& meaning, const std::
     if (meaning.portTaken && !outcome.platform.holder.empty()) {
         append(detail, "Port " + std::to_string(outcome.platform.port) + " is held by " +
                            outcome.platform.holder + ".");
-    } else if (meaning.status == 500) {
+    } else {
         append(detail, outcome.platform.sentence);
     }
-    if (meaning.beforeAnyChange) {
-        append(detail, "Nothing was changed.");
+    if (!row.reads()) {
+        append(detail, extentOf(outcome.platform));
     }
     return detail;
 }
 
-HttpResponse refused(const Outcome& outcome, const std::vector<FieldError>& errors,
+HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<FieldError>& errors,
                      const std::string& requestId) {
     const Meaning& meaning = meaningOf(outcome.code);
     Json::Value members(Json::objectValue);
     members["title"] = meaning.title;
     members["code"] = outcome.code;
-    members["detail"] = detailOf(outcome, meaning, errors);
+    members["detail"] = detailOf(row, outcome, meaning, errors);
+    if (!row.reads()) {
+        members["changed"] = outcome.platform.changed;
+    }
     for (const FieldError& error : errors) {
-        Json::Value entry(Json::objectValue);
-        entry["field"] = error.field;
-        entry["expected"] = error.expected;
-        members["errors"].append(entry);
+        members["errors"].append(toObject(error));
     }
     if (meaning.portTaken && !outcome.platform.holder.empty()) {
         members["holder"] = outcome.platform.holder;
     }
     return problemWith(meaning.status, std::move(members), requestId);
+}
+
+/// The module is content, but what is switched on does not run.
+HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["title"] = "A service that is switched on does not run";
+    members["detail"] =
+        "What was asked for is stored, but a service does not follow. " + sentenceOf(outcome.down);
+    members["changed"] = outcome.platform.changed;
+    for (const ServiceDown& each : outcome.down) {
+        members["down"].append(toObject(each));
+    }
+    return problemWith(500, std::move(members), requestId);
 }
 
 } // namespace
@@ -93,9 +118,12 @@ HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outc
                        const OpenApi& openApi, const std::string& requestId) {
     switch (outcome.kind) {
     case Outcome::Kind::success:
+        if (!outcome.down.empty()) {
+            return serviceDown(outcome, requestId);
+        }
         return outcome.data.isNull() ? HttpResponse{204, "", "", {}} : jsonResponse(200, outcome.data);
     case Outcome::Kind::refused:
-        return refused(outcome,
+        return refused(row, outcome,
                        outcome.code == badParameter ? openApi.explain(row, parameters)
                                                     : std::vector<FieldError>{},
                        requestId);

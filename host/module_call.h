@@ -25,6 +25,7 @@ struct Outcome {
     std::string defect;
     std::vector<std::string> logLines;
     PlatformReport platform;
+    std::vector<ServiceDown> down; ///< of what is switched on, after a change that the module has accepted
     double seconds = 0;
 };
 

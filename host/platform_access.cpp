@@ -29,19 +29,23 @@ std::shared_ptr<const PlatformObserver> currentObserver() {
     return observation().observer;
 }
 
-thread_local bool changed = false;
+thread_local PlatformReport report;
 
-/// Sees each effect of a request before it happens, and lets it happen.
-EffectDecision seeEffect(Effect effect, std::string_view subject) {
-    if (effect == Effect::store || effect == Effect::start || effect == Effect::stop ||
-        effect == Effect::runKey) {
-        changed = true;
+/// Takes note of an effect of this thread's request.
+void noteEffect(Effect effect, std::string_view subject, int result, std::chrono::nanoseconds) {
+    const bool done = result >= 0;
+    if (effect == Effect::store) {
+        report.stored = report.stored || done;
+        report.storeFailed = report.storeFailed || !done;
     }
+    // A daemon whose start or stop failed half-way is not what it was either.
+    const bool daemon = effect == Effect::start || effect == Effect::stop;
+    report.changed =
+        report.changed || daemon || (done && (effect == Effect::store || effect == Effect::runKey));
     const auto observer = currentObserver();
-    if (effect == Effect::start && observer != nullptr && observer->daemonStarted) {
+    if (effect == Effect::start && done && observer != nullptr && observer->daemonStarted) {
         observer->daemonStarted(std::string(subject));
     }
-    return {};
 }
 
 AdminLogEntry toEntry(const LogEntry& entry) {
@@ -100,15 +104,30 @@ void unobservePlatform() {
 void beginPlatformRequest(const std::string& actor, const std::string& address) {
     clearLastError();
     setRequestActor(actor, address);
-    changed = false;
-    setEffectHook(seeEffect);
+    report = {};
+    setEffectReport(noteEffect);
 }
 
 PlatformReport endPlatformRequest() {
-    setEffectHook({});
+    setEffectReport({});
     setRequestActor("", "");
     const PortConflict conflict = lastPortConflict();
-    return {changed, lastErrorSentence(), conflict.holder, conflict.port};
+    report.sentence = lastErrorSentence();
+    report.holder = conflict.holder;
+    report.port = conflict.port;
+    return std::exchange(report, {});
+}
+
+std::vector<ServiceDown> servicesDown() {
+    std::vector<ServiceDown> down;
+    for (const velt::ServiceDown& each : velt::servicesDown()) {
+        down.push_back({each.service, each.reason, each.servesFormerSettings});
+    }
+    return down;
+}
+
+std::map<std::string, std::uint64_t> daemonRestarts() {
+    return {{"ftp", velt::daemonRestarts("ftpd")}, {"sftp", velt::daemonRestarts("sftp")}};
 }
 
 std::optional<std::vector<AdminLogEntry>> queryAdminLog(const AdminLogQuery& query, std::string& error) {

@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <map>
 #include <optional>
 #include <string>
 #include <vector>
@@ -42,15 +43,17 @@ struct AdminLogQuery {
 struct PlatformObserver {
     std::function<void(const std::string& service, const std::string& action)> serviceAction;
     std::function<void(const AdminLogEntry&)> logEntry;
-    std::function<void(const std::string& service)> daemonStarted;
+    std::function<void(const std::string& service)> daemonStarted; ///< at the request of somebody
 };
 
 /// What the platform knows of the request that this thread has served.
 struct PlatformReport {
-    bool changed = false; ///< something was stored, started or stopped
-    std::string sentence; ///< of the last error; "" when there was none
-    std::string holder;   ///< of the port that was found taken; "" when none was
-    int port = 0;         ///< that port
+    bool changed = false;     ///< something was stored, started or stopped
+    bool stored = false;      ///< something was stored
+    bool storeFailed = false; ///< something could not be stored
+    std::string sentence;     ///< of the last error; "" when there was none
+    std::string holder;       ///< of the port that was found taken; "" when none was
+    int port = 0;             ///< that port
 };
 
 /// Opens the platform's state below the root. Before any other call, while the process has one thread. False,
@@ -60,6 +63,20 @@ bool openPlatform(const std::filesystem::path& stateRoot, std::string& error);
 /// Starts the services that the settings enable. False, with the reason in `error`, when one does not start;
 /// the others run.
 bool startEnabledServices(std::string& error);
+
+/// A service that the settings enable and that does not follow them.
+struct ServiceDown {
+    std::string service;               ///< "ftp" (with FTPS) or "sftp"
+    std::string reason;                ///< a sentence
+    bool servesFormerSettings = false; ///< it runs, but not with the settings that are stored now
+};
+
+/// All of them, at this moment: while a change restarts a service, that one is down as well.
+std::vector<ServiceDown> servicesDown();
+
+/// How often each daemon ("ftp", "sftp") was started again after it had ended by itself. Begins anew at 0
+/// when the service is switched off and on.
+std::map<std::string, std::uint64_t> daemonRestarts();
 
 /// Observes the platform until unobservePlatform, after which no observer is running.
 void observePlatform(PlatformObserver observer);

@@ -9,7 +9,7 @@
 namespace velt::host {
 
 const char* reasonPhrase(int status) {
-    static constexpr std::array<std::pair<int, const char*>, 19> phrases{{
+    static constexpr std::array<std::pair<int, const char*>, 20> phrases{{
         {200, "OK"},
         {201, "Created"},
         {204, "No Content"},
@@ -20,6 +20,7 @@ const char* reasonPhrase(int status) {
         {405, "Method Not Allowed"},
         {408, "Request Timeout"},
         {409, "Conflict"},
+        {412, "Precondition Failed"},
         {413, "Content Too Large"},
         {417, "Expectation Failed"},
         {422, "Unprocessable Content"},
@@ -50,6 +51,21 @@ HttpResponse problemWith(int status, Json::Value members, const std::string& req
     HttpResponse response = jsonResponse(status, members);
     response.contentType = "application/problem+json";
     return response;
+}
+
+HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
+                          const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["detail"] = error.field + ": expected " + error.expected + "." + extent;
+    members["errors"].append(toObject(error));
+    return problemWith(status, std::move(members), requestId);
+}
+
+Json::Value toObject(const FieldError& error) {
+    Json::Value object(Json::objectValue);
+    object["field"] = error.field;
+    object["expected"] = error.expected;
+    return object;
 }
 
 HttpResponse jsonResponse(int status, const Json::Value& value) {

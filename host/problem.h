@@ -3,6 +3,7 @@
 #define VELT_HOST_PROBLEM_H
 
 #include "host/http/message.h"
+#include "host/openapi.h"
 
 #include <json/value.h>
 
@@ -18,6 +19,13 @@ HttpResponse problem(int status, const std::string& detail, const std::string& r
 
 /// A problem with the members given; those of RFC 9457 are filled in when they are missing.
 HttpResponse problemWith(int status, Json::Value members, const std::string& requestId);
+
+/// A problem with one field of what was sent; `extent` says what became of the request.
+HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
+                          const std::string& requestId);
+
+/// {"field", "expected"}
+Json::Value toObject(const FieldError& error);
 
 /// A JSON value with its status.
 HttpResponse jsonResponse(int status, const Json::Value& value);

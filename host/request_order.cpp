@@ -4,10 +4,19 @@
 
 namespace velt::host {
 
+namespace {
+
+constexpr unsigned unorderedThreads = 2;
+
+} // namespace
+
 RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting) : maxWaiting_(maxWaiting) {
-    threads_.reserve(threads);
+    threads_.reserve(threads + unorderedThreads);
     for (unsigned i = 0; i < threads; ++i) {
-        threads_.emplace_back([this] { work(); });
+        threads_.emplace_back([this] { work(ordered_); });
+    }
+    for (unsigned i = 0; i < unorderedThreads; ++i) {
+        threads_.emplace_back([this] { work(unordered_); });
     }
 }
 
@@ -16,15 +25,15 @@ RequestOrder::~RequestOrder() {
 }
 
 bool RequestOrder::submit(Kind kind, Task task) {
+    Pool& pool = kind == Kind::unordered ? unordered_ : ordered_;
     {
         const std::lock_guard lock(mutex_);
-        if (stopping_ || ordered_.size() + unordered_.size() >= maxWaiting_) {
+        if (stopping_ || pool.queue.size() >= maxWaiting_) {
             return false;
         }
-        auto& queue = kind == Kind::unordered ? unordered_ : ordered_;
-        queue.push_back({kind, std::move(task)});
+        pool.queue.push_back({kind, std::move(task)});
     }
-    changed_.notify_one();
+    pool.changed.notify_one();
     return true;
 }
 
@@ -33,7 +42,8 @@ void RequestOrder::stop() {
         const std::lock_guard lock(mutex_);
         stopping_ = true;
     }
-    changed_.notify_all();
+    ordered_.changed.notify_all();
+    unordered_.changed.notify_all();
     for (std::thread& thread : threads_) {
         if (thread.joinable()) {
             thread.join();
@@ -42,14 +52,7 @@ void RequestOrder::stop() {
 }
 
 bool RequestOrder::mayStart(Kind kind) const {
-    return kind == Kind::read ? !writing_ : !writing_ && reading_ == 0;
-}
-
-std::deque<RequestOrder::Waiting>* RequestOrder::nextQueue() {
-    if (!unordered_.empty()) {
-        return &unordered_;
-    }
-    return !ordered_.empty() && mayStart(ordered_.front().kind) ? &ordered_ : nullptr;
+    return kind == Kind::unordered || (!writing_ && (kind == Kind::read || reading_ == 0));
 }
 
 void RequestOrder::started(Kind kind) {
@@ -68,28 +71,27 @@ void RequestOrder::finished(Kind kind) {
     }
 }
 
-void RequestOrder::work() {
+void RequestOrder::work(Pool& pool) {
     std::unique_lock lock(mutex_);
     while (true) {
-        std::deque<Waiting>* const queue = nextQueue();
-        if (queue == nullptr) {
-            if (stopping_ && ordered_.empty()) {
-                return;
-            }
-            changed_.wait(lock);
+        if (pool.queue.empty() && stopping_) {
+            return;
+        }
+        if (pool.queue.empty() || !mayStart(pool.queue.front().kind)) {
+            pool.changed.wait(lock);
             continue;
         }
-        Waiting next = std::move(queue->front());
-        queue->pop_front();
+        Waiting next = std::move(pool.queue.front());
+        pool.queue.pop_front();
         started(next.kind);
         lock.unlock();
         // The next in the queue may be a read that can run beside this one.
-        changed_.notify_one();
+        pool.changed.notify_one();
         next.task();
         next.task = nullptr;
         lock.lock();
         finished(next.kind);
-        changed_.notify_all();
+        pool.changed.notify_all();
     }
 }
 

@@ -13,9 +13,9 @@
 
 namespace velt::host {
 
-/// A pool of threads. No read runs while a write runs, and no two writes run at once; a read that comes after
-/// a waiting write waits for it too, so that writes do not starve. No thread waits in a lock for another's
-/// turn.
+/// Two pools of threads. No read runs while a write runs, and no two writes run at once; a read that comes
+/// after a waiting write waits for it too, so that writes do not starve. What needs no module has threads of
+/// its own: modules that block all of theirs do not delay it. No thread waits in a lock for another's turn.
 class RequestOrder {
 public:
     enum class Kind {
@@ -27,6 +27,8 @@ public:
     /// Tasks must not throw.
     using Task = std::function<void()>;
 
+    /// With so many threads for reads and writes. Of each kind, ordered and unordered, as many as said may
+    /// wait.
     RequestOrder(unsigned threads, std::size_t maxWaiting);
 
     /// Stops as stop() does.
@@ -46,17 +48,20 @@ private:
         Task task;
     };
 
-    void work();
+    struct Pool {
+        std::deque<Waiting> queue;
+        std::condition_variable changed;
+    };
+
+    void work(Pool& pool);
     bool mayStart(Kind kind) const;
-    std::deque<Waiting>* nextQueue();
     void started(Kind kind);
     void finished(Kind kind);
 
     const std::size_t maxWaiting_;
     std::mutex mutex_;
-    std::condition_variable changed_;
-    std::deque<Waiting> ordered_;
-    std::deque<Waiting> unordered_;
+    Pool ordered_;
+    Pool unordered_;
     int reading_ = 0;
     bool writing_ = false;
     bool stopping_ = false;

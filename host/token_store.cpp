@@ -1,6 +1,7 @@
 #include "host/token_store.h"
 
 #include "host/clock.h"
+#include "host/file_text.h"
 #include "host/json_text.h"
 #include "host/random_text.h"
 
@@ -13,9 +14,6 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
-#include <fstream>
-#include <iterator>
-#include <sstream>
 #include <system_error>
 #include <utility>
 
@@ -106,15 +104,14 @@ TokenStore::TokenStore(std::filesystem::path file) : file_(std::move(file)) {
 }
 
 void TokenStore::read() {
-    std::ifstream stream(file_);
-    if (!stream) {
+    const auto text = readFileText(file_);
+    if (!text) {
         if (errno == ENOENT) {
             return;
         }
         throw TokenError("The file of tokens " + file_.string() + " cannot be read: " + systemError() + ".");
     }
-    const std::string text{std::istreambuf_iterator<char>(stream), {}};
-    const ParsedObject parsed = parseObject(text);
+    const ParsedObject parsed = parseObject(*text);
     const Json::Value& list = parsed.value["tokens"];
     bool good = parsed.error.empty() && list.isArray();
     for (Json::ArrayIndex i = 0; good && i < list.size(); ++i) {
@@ -136,12 +133,13 @@ void TokenStore::store(const std::vector<Token>& tokens) const {
     for (const Token& token : tokens) {
         root["tokens"].append(toObject(token));
     }
-    std::error_code error;
+    std::error_code folderError;
     const std::filesystem::path folder = file_.parent_path();
-    std::filesystem::create_directories(folder, error);
+    std::filesystem::create_directories(folder, folderError);
     const std::filesystem::path fresh = file_.string() + ".new";
-    if (error || !writeDurably(fresh, toJson(root) + "\n") || ::rename(fresh.c_str(), file_.c_str()) != 0 ||
-        !syncFolder(folder)) {
+    errno = folderError.value();
+    if (folderError || !writeDurably(fresh, toJson(root) + "\n") ||
+        ::rename(fresh.c_str(), file_.c_str()) != 0 || !syncFolder(folder)) {
         throw TokenError("The file of tokens " + file_.string() + " cannot be written: " + systemError() +
                          ".");
     }

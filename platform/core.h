@@ -56,7 +56,8 @@ void VLIBCSzHashFree(VLIBCSzHash* map);
 
 /// Reads `key` from the key=value text file `path` into `value`, a buffer of `size` bytes; a longer
 /// value is cut to size - 1 bytes and NUL-terminated. `flags` is 0. Positive when the key was found,
-/// 0 when the file has no such key (the buffer is then not to be relied on), negative on failure.
+/// 0 when the file has no such key, or is not there (the buffer is then not to be relied on), negative on
+/// failure.
 int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int size, int flags);
 
 /// Writes `key` with `value` into the system information file ("/etc/veltinfo.conf"). The file's

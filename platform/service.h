@@ -19,8 +19,8 @@ int VLIBServicectlStart(const char* service, int flags);
 /// Stops a daemon; stopping one that does not run succeeds. `flags` is 0. Negative on failure.
 int VLIBServicectlStop(const char* service, int flags);
 
-/// Sets the service's run key, which decides whether it starts at boot: 1 after it was started, 2
-/// after it was stopped. Negative on failure.
+/// Sets the service's run key, by which a platform may decide whether it starts at boot: 1 after it was
+/// started, 2 after it was stopped. It does not change whether the service is enabled. Negative on failure.
 int VLIBServicecfgRunKeySet(const char* service, int value);
 
 /// Starts a service, and sets its run key to 1. `flags` is 0. Negative on failure.

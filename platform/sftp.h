@@ -29,7 +29,8 @@ static_assert(offsetof(_tag_VELT_SFTP_CONFIG_, reserved2) == 24, "8 bytes are th
 /// Fills the record with the stored settings. `which` is 1. Negative on failure.
 int VELTSFTPConfigGet(int which, _tag_VELT_SFTP_CONFIG_* out);
 
-/// Stores the enable flag and the port. Negative on failure.
+/// Stores the enable flag and the port. Negative on failure. A platform whose settings are changed by several
+/// callers may leave alone the one that is as the calling thread last read or stored it.
 int VELTSFTPConfigSet(int enable, int port);
 
 /// Non-zero while the SFTP service runs, whatever the stored settings say. A negative result reads as

@@ -1,8 +1,9 @@
 // What the platform library offers the program that loads the module over it, beside the contract.
 //
-// A host, at its start: openState, the subscriptions, startEnabledServices. Then, for each request, on the
-// thread that serves it: setRequestActor, clearLastError, the module's entry function, and after a failure
-// lastErrorSentence or lastPortConflict for the answer.
+// A host, at its start: openState, the subscriptions, startEnabledServices, watchServices. Then, for each
+// request, on the thread that serves it: setRequestActor, clearLastError, the module's entry function, and
+// after a failure lastErrorSentence or lastPortConflict for the answer. A change that was accepted is in
+// force when servicesDown is empty after it.
 //
 // Functions with an int result return a negative one on failure, with the last error set. Unless it says
 // otherwise a function may be called from any thread.
@@ -34,6 +35,36 @@ int openState(const std::filesystem::path& root);
 /// daemon accepts connections or has failed. One that fails does not keep the others from starting; the
 /// result is then negative.
 int startEnabledServices();
+
+/// Looks, twice a second and on a thread of its own, whether the supervisors of the daemons live, and starts
+/// what lost its supervisor again with the stored settings (ended, where these have switched it off): its
+/// sessions are cut. A supervisor brings back a daemon that dies; killed itself, it cannot, and its daemon's
+/// words go nowhere. Where systemd keeps the supervisors, it does this alone. A second call does nothing. No
+/// process may fork a child that goes on with this library while it watches.
+int watchServices();
+
+/// Ends the watch, if there is one, and waits for what it does at the moment. To be called before the process
+/// ends.
+void unwatchServices();
+
+/// A service that the stored settings enable and that does not follow them.
+struct ServiceDown {
+    std::string service; ///< "ftp" (FTP and FTPS, one daemon) or "sftp"
+    std::string reason;  ///< a sentence: the daemon's own words of its last start, where it had some
+    bool servesFormerSettings = false; ///< it runs, with the settings that it had before the stored ones
+    bool operator==(const ServiceDown&) const = default;
+};
+
+/// The enabled services that are down, or serve former settings since a restart with the stored ones was
+/// refused: empty when all is well. startEnabledServices tries them once more. A service whose settings
+/// cannot be read is listed, since nobody can tell that it is off. It is the state of this moment: between
+/// the stop and the start of a change that somebody else makes, a service is down as well. Leaves the last
+/// error alone.
+std::vector<ServiceDown> servicesDown();
+
+/// How often the daemon behind the service ("ftpd", "sftp") was started again after it had ended by itself,
+/// since its supervisor, or the machine, began. 0 for one that is off, and for an unknown name.
+std::uint64_t daemonRestarts(const std::string& service);
 
 /// Names who makes the request that this thread serves now, and the address it came from, for the entries of
 /// the administrator log. Holds for this thread until the next call; two empty texts: the system itself.

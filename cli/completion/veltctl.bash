@@ -23,8 +23,8 @@ _veltctl_options() {
     echo '--help --json --url --socket --token-file --ca-file --timeout'
     case $1 in
         '') echo '--version' ;;
-        log) echo '--since --event --actor --before --limit --all' ;;
-        events) echo '--count' ;;
+        log) echo '--since --event --actor --before --limit --all --follow' ;;
+        events) echo '--count --kind' ;;
         'ftp get' | 'ftp set') echo '--api-version' ;;
         'chroot users list') echo '--others --offset --limit --type --domain --filter' ;;
         'tokens create') echo '--role' ;;
@@ -38,7 +38,7 @@ _veltctl_options() {
 _veltctl_takes_word() {
     case $1 in
         --url | --socket | --token-file | --ca-file | --timeout | --since | --event | --actor | --before | --limit | \
-            --count | --api-version | --offset | --type | --domain | --filter | --role | --output | -o) return 0 ;;
+            --count | --kind | --api-version | --offset | --type | --domain | --filter | --role | --output | -o) return 0 ;;
     esac
     return 1
 }
@@ -47,6 +47,7 @@ _veltctl_takes_word() {
 _veltctl_option_value() {
     case $1 in
         --type) COMPREPLY=($(compgen -W 'local domain ldap all' -- "$2")) ;;
+        --kind) COMPREPLY=($(compgen -W 'service log request' -- "$2")) ;;
         --role) COMPREPLY=($(compgen -W 'admin viewer' -- "$2")) ;;
         --api-version) COMPREPLY=($(compgen -W '1 2 3' -- "$2")) ;;
         --socket | --token-file | --ca-file | --output | -o) _veltctl_files "$2" ;;

@@ -8,16 +8,15 @@ namespace velt::host {
 
 namespace {
 
-std::int64_t nowInMilliseconds() {
+std::uint64_t nowInMilliseconds() {
     const auto now = std::chrono::steady_clock::now().time_since_epoch();
-    return std::chrono::duration_cast<std::chrono::milliseconds>(now).count();
+    return static_cast<std::uint64_t>(std::chrono::duration_cast<std::chrono::milliseconds>(now).count());
 }
 
 } // namespace
 
 void Connection::enter(State state, std::chrono::milliseconds time) {
-    state_ = state;
-    deadline_ = nowInMilliseconds() + time.count();
+    moment_ = moment(state, nowInMilliseconds() + static_cast<std::uint64_t>(time.count()));
     // A connection that stopped being used while the host was ending the unused ones.
     if (ending_ && state == State::idle) {
         shutdown(descriptor(), SHUT_RD);
@@ -25,20 +24,21 @@ void Connection::enter(State state, std::chrono::milliseconds time) {
 }
 
 void Connection::enterWithoutDeadline(State state) {
-    state_ = state;
-    deadline_ = never;
+    moment_ = moment(state, never);
 }
 
 void Connection::enforceDeadline() {
-    if (nowInMilliseconds() <= deadline_) {
+    Moment seen = moment_;
+    const State state = stateOf(seen);
+    // The deadline is used up; when the connection has moved on meanwhile, it has another one.
+    if (nowInMilliseconds() <= seen >> stateBits ||
+        !moment_.compare_exchange_strong(seen, moment(state, never))) {
         return;
     }
-    const State state = state_;
     if (state == State::idle || state == State::head || state == State::body) {
+        // The reader wakes up, and answers if it has to. A request that was complete a moment ago is still
+        // answered.
         tooSlow_ = state != State::idle;
-        // The reader wakes up, and answers if it has to; the deadline of its writing is the next. A request
-        // that was complete a moment ago is still answered.
-        deadline_ = never;
         shutdown(descriptor(), SHUT_RD);
     } else {
         shutdown(descriptor(), SHUT_RDWR);
@@ -47,12 +47,22 @@ void Connection::enforceDeadline() {
 
 void Connection::endWhenUnused() {
     ending_ = true;
-    const State state = state_;
+    const State state = this->state();
     if (state == State::idle || state == State::head) {
         shutdown(descriptor(), SHUT_RD);
     } else if (state == State::events) {
         shutdown(descriptor(), SHUT_RDWR);
     }
+}
+
+bool Connection::giveWay() {
+    const State state = this->state();
+    const bool waits = state != State::working && state != State::writing && state != State::events;
+    if (trusted_ || !waits || givesWay_.exchange(true)) {
+        return false;
+    }
+    shutdown(descriptor(), SHUT_RDWR);
+    return true;
 }
 
 void Connections::add(const std::shared_ptr<Connection>& connection) {
@@ -81,6 +91,12 @@ template<class Action> void Connections::forEach(const Action& action) {
 
 void Connections::enforceDeadlines() {
     forEach([](Connection& connection) { connection.enforceDeadline(); });
+}
+
+bool Connections::makeRoom() {
+    bool found = false;
+    forEach([&found](Connection& connection) { found = found || connection.giveWay(); });
+    return found;
 }
 
 void Connections::endUnused() {

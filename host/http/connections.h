@@ -20,7 +20,7 @@ public:
         idle,    ///< between requests
         head,    ///< part of a head is there
         body,    ///< part of a body is there
-        working, ///< the request is being served: no deadline
+        working, ///< the request is being served, or its refusal waits: no deadline
         writing,
         events,   ///< a stream of events
         draining, ///< the answer is out, what the client still sends is thrown away
@@ -37,10 +37,20 @@ public:
     /// The host stops: ends the connection at once when nobody waits for an answer on it.
     void endWhenUnused();
 
+    /// Ends a connection that takes another's place: one that waits for its client, and on which no request
+    /// has been granted access yet. False for others, and for one that ends so already.
+    bool giveWay();
+
 protected:
     void enter(State state, std::chrono::milliseconds time);
     void enterWithoutDeadline(State state);
-    State state() const { return state_; }
+    State state() const { return stateOf(moment_); }
+
+    /// A request on this connection was granted access.
+    void trust() { trusted_ = true; }
+
+    /// This connection is one beyond those that have a place, so it has none to give.
+    void takeNoPlace() { givesWay_ = true; }
 
     /// Whether the client was too slow with its request.
     bool tooSlow() const { return tooSlow_; }
@@ -51,12 +61,22 @@ protected:
     virtual int descriptor() = 0;
 
 private:
-    static constexpr std::int64_t never = INT64_MAX;
+    // State and deadline change together: who finds that a deadline has passed must not act on the state that
+    // came after it.
+    using Moment = std::uint64_t;
+    static constexpr unsigned stateBits = 3;
+    static constexpr std::uint64_t never = UINT64_MAX >> stateBits;
 
-    std::atomic<State> state_{State::idle};
-    std::atomic<std::int64_t> deadline_{never};
+    static Moment moment(State state, std::uint64_t deadline) {
+        return deadline << stateBits | static_cast<Moment>(state);
+    }
+    static State stateOf(Moment moment) { return static_cast<State>(moment & ((1U << stateBits) - 1)); }
+
+    std::atomic<Moment> moment_{moment(State::idle, never)};
     std::atomic<bool> tooSlow_{false};
     std::atomic<bool> ending_{false};
+    std::atomic<bool> trusted_{false};
+    std::atomic<bool> givesWay_{false};
 };
 
 /// Thread-safe.
@@ -65,6 +85,9 @@ public:
     void add(const std::shared_ptr<Connection>& connection);
     void enforceDeadlines();
     void endUnused();
+
+    /// Lets the oldest connection that can give way to a new one. False when none can.
+    bool makeRoom();
 
     /// Those that are open now.
     std::size_t count();

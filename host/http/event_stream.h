@@ -18,8 +18,8 @@ template<class Stream>
 class EventStream final : public EventReader, public std::enable_shared_from_this<EventStream<Stream>> {
 public:
     explicit EventStream(std::shared_ptr<Session<Stream>> session)
-        : session_(std::move(session)), strand_(session_->context_.get_executor()),
-          heartbeat_(session_->context_) {}
+        : session_(std::move(session)), strand_(session_->shared_.context.get_executor()),
+          heartbeat_(session_->shared_.context) {}
 
     static void start(const std::shared_ptr<Session<Stream>>& session) {
         const auto stream = std::make_shared<EventStream>(session);

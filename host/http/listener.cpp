@@ -1,8 +1,9 @@
 #include "host/http/listener.h"
 
+#include "host/accounts.h"
+
 #include <arpa/inet.h>
 #include <fcntl.h>
-#include <grp.h>
 #include <netdb.h>
 #include <netinet/in.h>
 #include <sys/socket.h>
@@ -33,15 +34,24 @@ const sockaddr* generic(const void* address) {
     return static_cast<const sockaddr*>(address);
 }
 
-bool isLoopback(const addrinfo& info) {
-    if (info.ai_family == AF_INET) {
+bool isLoopback(const sockaddr* name, socklen_t size) {
+    if (name->sa_family == AF_INET) {
         sockaddr_in address{};
-        std::memcpy(&address, info.ai_addr, sizeof address);
+        std::memcpy(&address, name, sizeof address);
         return (ntohl(address.sin_addr.s_addr) >> 24U) == 127;
     }
     sockaddr_in6 address{};
-    std::memcpy(&address, info.ai_addr, std::min(sizeof address, static_cast<std::size_t>(info.ai_addrlen)));
-    return info.ai_family == AF_INET6 && IN6_IS_ADDR_LOOPBACK(&address.sin6_addr) != 0;
+    std::memcpy(&address, name, std::min(sizeof address, static_cast<std::size_t>(size)));
+    return name->sa_family == AF_INET6 && IN6_IS_ADDR_LOOPBACK(&address.sin6_addr) != 0;
+}
+
+/// Throws for an address that other machines reach, unless these are allowed.
+void checkReach(const std::string& address, const sockaddr* name, socklen_t size, bool allowRemote) {
+    if (!allowRemote && !isLoopback(name, size)) {
+        throw ListenError(address +
+                          " can be reached from other machines: that needs --allow-remote and a TLS "
+                          "certificate.");
+    }
 }
 
 /// "[::1]:80" in its host and its port.
@@ -64,12 +74,21 @@ struct SocketName {
 
 using NameGetter = int (*)(int, sockaddr*, socklen_t*);
 
-/// The address and port of one end of a socket.
-std::pair<std::string, unsigned short> nameOf(int descriptor, NameGetter get) {
+/// Of one end of a socket; family AF_UNSPEC when it has none.
+SocketName socketName(int descriptor, NameGetter get) {
     SocketName name;
     void* const raw = &name.address;
-    std::array<char, INET6_ADDRSTRLEN> text{};
     if (get(descriptor, static_cast<sockaddr*>(raw), &name.size) != 0) {
+        name = {};
+    }
+    return name;
+}
+
+/// The address and port of one end of a socket.
+std::pair<std::string, unsigned short> nameOf(int descriptor, NameGetter get) {
+    const SocketName name = socketName(descriptor, get);
+    std::array<char, INET6_ADDRSTRLEN> text{};
+    if (name.address.ss_family == AF_UNSPEC) {
         return {"", 0};
     }
     if (name.address.ss_family == AF_INET) {
@@ -84,11 +103,15 @@ std::pair<std::string, unsigned short> nameOf(int descriptor, NameGetter get) {
     return {text.data(), ntohs(address.sin6_port)};
 }
 
+/// An option of a socket, 0 when it cannot be had: no address family, and "no".
+int optionOf(int descriptor, int option) {
+    int value = 0;
+    socklen_t size = sizeof value;
+    return getsockopt(descriptor, SOL_SOCKET, option, &value, &size) == 0 ? value : 0;
+}
+
 int familyOf(int descriptor) {
-    int family = AF_UNSPEC;
-    socklen_t size = sizeof family;
-    getsockopt(descriptor, SOL_SOCKET, SO_DOMAIN, &family, &size);
-    return family;
+    return optionOf(descriptor, SO_DOMAIN);
 }
 
 sockaddr_un unixAddress(const std::filesystem::path& path) {
@@ -125,13 +148,8 @@ void removeStale(const std::filesystem::path& path, const sockaddr_un& address) 
 }
 
 void giveToGroup(const std::filesystem::path& path, const std::string& name) {
-    std::array<char, 16384> buffer{};
-    group record{};
-    group* found = nullptr;
-    if (getgrnam_r(name.c_str(), &record, buffer.data(), buffer.size(), &found) != 0 || found == nullptr) {
-        return;
-    }
-    if (lchown(path.c_str(), static_cast<uid_t>(-1), found->gr_gid) != 0) {
+    const auto group = groupNamed(name);
+    if (group && lchown(path.c_str(), static_cast<uid_t>(-1), *group) != 0) {
         throw ListenError("The group " + name + " cannot be given " + path.string() + ": " + systemError() +
                           ".");
     }
@@ -184,11 +202,7 @@ Listener Listener::tcp(const std::string& address, bool allowRemote) {
         throw ListenError("\"" + address + "\" is no address to listen on: " + gai_strerror(error) + ".");
     }
     const std::unique_ptr<addrinfo, decltype(&freeaddrinfo)> owner(list, freeaddrinfo);
-    if (!allowRemote && !isLoopback(*list)) {
-        throw ListenError(address +
-                          " can be reached from other machines: that needs --allow-remote and a TLS "
-                          "certificate.");
-    }
+    checkReach(address, list->ai_addr, list->ai_addrlen, allowRemote);
     Listener listener(socket(list->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0), list->ai_family,
                       {});
     const int on = 1;
@@ -223,7 +237,7 @@ Listener Listener::unixSocket(const std::filesystem::path& path, const std::stri
     return listener;
 }
 
-std::vector<Listener> Listener::inherited() {
+std::vector<Listener> Listener::inherited(bool allowRemote) {
     constexpr int firstDescriptor = 3;
     std::vector<Listener> listeners;
     const char* const process = std::getenv("LISTEN_PID"); // NOLINT(concurrency-mt-unsafe)
@@ -233,18 +247,24 @@ std::vector<Listener> Listener::inherited() {
     }
     const long descriptors = std::clamp(std::strtol(count, nullptr, 10), 0L, 64L);
     for (int descriptor = firstDescriptor; descriptor < firstDescriptor + descriptors; ++descriptor) {
+        if (optionOf(descriptor, SO_ACCEPTCONN) == 0) {
+            throw ListenError("The descriptor " + std::to_string(descriptor) +
+                              " that was handed over is no listening socket.");
+        }
         fcntl(descriptor, F_SETFD, FD_CLOEXEC);
         fcntl(descriptor, F_SETFL, fcntl(descriptor, F_GETFL) | O_NONBLOCK);
         listeners.push_back(Listener(descriptor, familyOf(descriptor), {}));
+        if (!listeners.back().isUnixSocket()) {
+            const SocketName name = socketName(descriptor, getsockname);
+            checkReach(listeners.back().name(), generic(&name.address), name.size, allowRemote);
+        }
     }
     return listeners;
 }
 
 std::string Listener::name() const {
     if (isUnixSocket()) {
-        SocketName name;
-        void* const raw = &name.address;
-        getsockname(descriptor_, static_cast<sockaddr*>(raw), &name.size);
+        const SocketName name = socketName(descriptor_, getsockname);
         sockaddr_un address{};
         std::memcpy(&address, &name.address, std::min(sizeof address, static_cast<std::size_t>(name.size)));
         return static_cast<const char*>(address.sun_path);

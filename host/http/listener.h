@@ -29,7 +29,8 @@ public:
     static Listener unixSocket(const std::filesystem::path& path, const std::string& group);
 
     /// What the service manager hands over when it started this process by socket activation; usually none.
-    static std::vector<Listener> inherited();
+    /// The rule of tcp() holds for these as well. Throws ListenError.
+    static std::vector<Listener> inherited(bool allowRemote);
 
     Listener(Listener&& other) noexcept;
     Listener& operator=(Listener&&) = delete;

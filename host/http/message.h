@@ -32,7 +32,9 @@ struct HttpRequest {
     std::string origin;        ///< "" when there is none
     std::string fetchSite;     ///< "" when there is none
     std::string authorization; ///< "" when there is none
+    std::string ifMatch;       ///< "" when there is none
     std::string body;
+    bool wellFormed = true; ///< else the server refuses it as soon as access is granted
 
     /// The target without query, and the query without "?".
     std::string path() const { return target.substr(0, target.find('?')); }

@@ -43,6 +43,7 @@ void RequestReader::reset() {
     expectsContinue_ = false;
     scanned_ = 0;
     request_ = {};
+    refusal_ = {};
 }
 
 std::pair<char*, std::size_t> RequestReader::space() {
@@ -64,6 +65,10 @@ void RequestReader::added(std::size_t bytes) {
 
 bool RequestReader::hasBegun() const {
     return headDone_ || begin_ < end_;
+}
+
+RequestReader::Refused RequestReader::tooLargeBody() const {
+    return {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
 }
 
 RequestReader::Step RequestReader::refuse(int status, const char* detail) {
@@ -115,31 +120,34 @@ RequestReader::Step RequestReader::checkHead() {
     begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
     headDone_ = true;
     const bool tooLarge = error == http::error::body_limit;
-    if (error && error != http::error::need_more && !tooLarge && !parser.is_header_done()) {
+    const bool malformed = error && error != http::error::need_more && !tooLarge;
+    if (malformed && !parser.is_header_done()) {
         return error == http::error::bad_version ? refuse(505, "Only HTTP/1.0 and HTTP/1.1 are spoken.")
                                                  : refuse(400, "The request is no well-formed HTTP.");
     }
-    const auto& message = parser.get();
+    // What else is wrong is told later: access is looked at first.
+    refusal_ = faultOfHead(tooLarge, malformed);
+    fillRequest();
+    return Step::head;
+}
+
+RequestReader::Refused RequestReader::faultOfHead(bool bodyTooLarge, bool bodyMalformed) const {
+    const auto& message = parser_->http->get();
     const auto hosts = message.count(http::field::host);
     if (hosts > 1 || (hosts == 0 && message.version() == 11)) {
-        return refuse(400, "The head must hold exactly one Host.");
+        return {400, "The head must hold exactly one Host."};
     }
     const auto coding = message.find(http::field::transfer_encoding);
     if (coding != message.end() && !boost::beast::iequals(coding->value(), "chunked")) {
-        return refuse(501, "The only transfer coding that is understood is chunked.");
+        return {501, "The only transfer coding that is understood is chunked."};
     }
-    fillRequest();
-    if (!request_.target.starts_with('/')) {
-        return refuse(400, "The request's target must begin with \"/\".");
+    if (!message.target().starts_with('/')) {
+        return {400, "The request's target must begin with \"/\"."};
     }
-    // What is wrong with the body is told later: access is looked at first.
-    if (error && error != http::error::need_more) {
-        refusal_ = {400, "The body is no well-formed HTTP."};
+    if (bodyMalformed) {
+        return {400, "The body is no well-formed HTTP."};
     }
-    if (tooLarge) {
-        refusal_ = {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
-    }
-    return Step::head;
+    return bodyTooLarge ? tooLargeBody() : Refused{};
 }
 
 void RequestReader::fillRequest() {
@@ -153,9 +161,11 @@ void RequestReader::fillRequest() {
     // Two of them leave open which one counts, so neither does.
     const bool one = message.count(http::field::authorization) <= 1;
     request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
-    keepAlive_ = refusal_.detail.empty() && message.keep_alive();
-    expectsContinue_ =
-        boost::beast::iequals(message[http::field::expect], "100-continue") && !parser.is_done();
+    request_.ifMatch = text(message[http::field::if_match]);
+    request_.wellFormed = refusal_.detail.empty();
+    keepAlive_ = request_.wellFormed && message.keep_alive();
+    expectsContinue_ = request_.wellFormed && !parser.is_done() &&
+                       boost::beast::iequals(message[http::field::expect], "100-continue");
 }
 
 RequestReader::Step RequestReader::readBody() {
@@ -167,7 +177,7 @@ RequestReader::Step RequestReader::readBody() {
         boost::beast::error_code error;
         begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
         if (error == http::error::body_limit) {
-            refusal_ = {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
+            refusal_ = tooLargeBody();
             return Step::refused;
         }
         if (error && error != http::error::need_more) {

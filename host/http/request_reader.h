@@ -17,14 +17,15 @@ class RequestReader {
 public:
     enum class Step {
         needMore, ///< read more bytes
-        head,     ///< the head is there: look at it, then go on; comes once for each request
+        head,     ///< the head is there: look at it, then go on; comes once for each request, also for one
+                  ///< that is refused next if its head could be read
         request,  ///< the request is complete
         refused,  ///< no request can be read any more: refusal() says why
     };
 
     struct Refused {
         int status = 400;
-        std::string detail;
+        std::string detail; ///< "" when nothing is refused
     };
 
     RequestReader(std::size_t headLimit, std::size_t bodyLimit);
@@ -60,6 +61,8 @@ private:
     Step readBody();
     Step refuse(int status, const char* detail);
     Step checkHead();
+    Refused tooLargeBody() const;
+    Refused faultOfHead(bool bodyTooLarge, bool bodyMalformed) const;
     void fillRequest();
 
     const std::size_t headLimit_;

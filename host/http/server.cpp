@@ -67,7 +67,7 @@ struct HttpServer::Core {
     };
 
     Core(HttpHandler& theHandler, const HttpLimits& theLimits, const TlsFiles& tls)
-        : handler(theHandler), limits(theLimits), tlsContext(makeTlsContext(tls)), sweeper(context) {}
+        : shared{theHandler, theLimits}, tlsContext(makeTlsContext(tls)), sweeper(context) {}
 
     void accept(Door& door) {
         door.acceptor.async_accept(door.peer, [this, &door](const Error& error) {
@@ -98,7 +98,8 @@ struct HttpServer::Core {
             setsockopt(socket.native_handle(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
         }
         const std::size_t open = connections.count();
-        if (open >= limits.connections) {
+        // Who only connects must not keep those out who have something to ask.
+        if (open >= limits.connections && !connections.makeRoom()) {
             if (!isTls && open < limits.connections + refusedConnections) {
                 make<PlainStream>(std::move(socket), std::move(peer))->refuse();
             }
@@ -112,8 +113,7 @@ struct HttpServer::Core {
     }
 
     template<class Stream> std::shared_ptr<Session<Stream>> make(Stream stream, Peer peer) {
-        auto session =
-            std::make_shared<Session<Stream>>(context, std::move(stream), std::move(peer), handler, limits);
+        auto session = std::make_shared<Session<Stream>>(shared, std::move(stream), std::move(peer));
         connections.add(session);
         return session;
     }
@@ -151,11 +151,11 @@ struct HttpServer::Core {
         threads.clear();
     }
 
-    HttpHandler& handler;
-    const HttpLimits limits;
+    SessionShared shared;
+    const HttpLimits& limits = shared.limits;
+    asio::io_context& context = shared.context;
     std::unique_ptr<asio::ssl::context> tlsContext;
     Connections connections;
-    asio::io_context context;
     asio::executor_work_guard<Executor> work{context.get_executor()};
     std::vector<std::unique_ptr<Door>> doors;
     Timer sweeper;

@@ -17,6 +17,7 @@ struct HttpLimits {
     std::size_t head = std::size_t{16} * 1024; ///< bytes
     std::size_t body = std::size_t{1024} * 1024;
     std::size_t connections = 1000;
+    std::size_t delayedRefusals = 100; ///< that wait at one time; more failed attempts are answered at once
     std::size_t queuedEvents = std::size_t{256} * 1024; ///< bytes that a slow reader of events may lag behind
     std::chrono::milliseconds headTime{10'000};
     std::chrono::milliseconds bodyTime{30'000};

@@ -18,6 +18,7 @@
 #include <boost/asio/write.hpp>
 
 #include <array>
+#include <atomic>
 #include <memory>
 #include <string>
 #include <type_traits>
@@ -32,15 +33,22 @@ using Error = boost::system::error_code;
 
 template<class Stream> class EventStream;
 
+/// What all sessions of a server share. Outlives them.
+struct SessionShared {
+    HttpHandler& handler;
+    const HttpLimits limits;
+    boost::asio::io_context context{};
+    std::atomic<std::size_t> delayedRefusals{0};
+};
+
 /// One operation is in flight at a time, so a session needs no strand; it lives as long as an operation
 /// of it is pending.
 template<class Stream>
 class Session final : public Connection, public std::enable_shared_from_this<Session<Stream>> {
 public:
-    Session(boost::asio::io_context& context, Stream stream, Peer peer, HttpHandler& handler,
-            const HttpLimits& limits)
-        : context_(context), stream_(std::move(stream)), timer_(context), peer_(std::move(peer)),
-          handler_(handler), limits_(limits), reader_(limits.head, limits.body) {}
+    Session(SessionShared& shared, Stream stream, Peer peer)
+        : shared_(shared), stream_(std::move(stream)), timer_(shared.context), peer_(std::move(peer)),
+          handler_(shared.handler), limits_(shared.limits), reader_(limits_.head, limits_.body) {}
 
     /// Serves requests until either side ends the connection.
     void start() {
@@ -59,6 +67,7 @@ public:
     /// Answers 503 and ends the connection.
     void refuse() {
         if constexpr (!isTls) {
+            takeNoPlace();
             respond(handler_.failure(503, "Too many connections are open."), false);
         }
     }
@@ -134,6 +143,7 @@ private:
             refuseAccess(std::move(*refusal));
             return false;
         }
+        trust();
         if (!reader_.expectsContinue()) {
             return true;
         }
@@ -149,13 +159,18 @@ private:
 
     void refuseAccess(Refusal refusal) {
         enterWithoutDeadline(State::working);
-        if (!refusal.delayed) {
+        // Waiting refusals take connections: so many at once are no guesses but an attempt to use these up.
+        if (!refusal.delayed || ++shared_.delayedRefusals > limits_.delayedRefusals) {
+            shared_.delayedRefusals -= refusal.delayed ? 1U : 0U;
             respond(refusal.response, false);
             return;
         }
         timer_.expires_after(limits_.refusalDelay);
-        timer_.async_wait([self = this->shared_from_this(), response = std::move(refusal.response)](
-                              const Error&) mutable { self->respond(response, false); });
+        timer_.async_wait(
+            [self = this->shared_from_this(), response = std::move(refusal.response)](const Error&) {
+                --self->shared_.delayedRefusals;
+                self->respond(response, false);
+            });
     }
 
     void serve() {
@@ -168,7 +183,7 @@ private:
         withBody_ = request.method != "HEAD";
         handler_.handle(std::move(request), principal_,
                         [self = this->shared_from_this()](HttpResponse response) {
-                            auto& context = self->context_;
+                            auto& context = self->shared_.context;
                             boost::asio::post(context, [self, answer = std::move(response)] {
                                 self->respond(answer, self->reader_.keepAlive());
                             });
@@ -220,7 +235,7 @@ private:
                                  });
     }
 
-    boost::asio::io_context& context_;
+    SessionShared& shared_;
     Stream stream_;
     boost::asio::basic_waitable_timer<std::chrono::steady_clock,
                                       boost::asio::wait_traits<std::chrono::steady_clock>, Executor>

@@ -51,12 +51,18 @@ LogDatabase* currentDatabase(Connection& open) {
     return open.database.get();
 }
 
-int store(LogEntry& entry) {
+/// Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
+std::optional<LogRetention> retentionIfReadable() {
+    const LastErrorKept kept;
     const std::optional<LogRetention> retention = loadRetention();
-    // Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
     if (!retention) {
         syslog(LOG_WARNING, "administrator log: nothing is removed: %s", lastErrorSentence().c_str());
     }
+    return retention;
+}
+
+int store(LogEntry& entry) {
+    const std::optional<LogRetention> retention = retentionIfReadable();
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);
     LogDatabase* database = currentDatabase(open);

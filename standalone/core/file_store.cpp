@@ -49,13 +49,6 @@ int makeFolder(const fs::path& folder) {
     return 0;
 }
 
-bool isSameFile(int fd, const fs::path& path) {
-    struct stat opened {};
-    struct stat named {};
-    return ::fstat(fd, &opened) == 0 && ::lstat(path.c_str(), &named) == 0 && opened.st_dev == named.st_dev &&
-           opened.st_ino == named.st_ino;
-}
-
 // The temporary file has one fixed name, so that what a crash leaves behind is taken up by the next store and
 // never piles up. Its lock keeps a second writer out until the first has renamed it; the second then holds a
 // file that has lost its name, and begins anew.
@@ -86,6 +79,13 @@ bool writeAll(int fd, std::string_view contents) {
 }
 
 } // namespace
+
+bool isSameFile(int fd, const fs::path& path) {
+    struct stat opened {};
+    struct stat named {};
+    return ::fstat(fd, &opened) == 0 && ::lstat(path.c_str(), &named) == 0 && opened.st_dev == named.st_dev &&
+           opened.st_ino == named.st_ino;
+}
 
 int replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
     const fs::path folder = path.has_parent_path() ? path.parent_path() : fs::path(".");

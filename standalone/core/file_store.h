@@ -19,6 +19,9 @@ int replaceFile(const std::filesystem::path& path, std::string_view contents, mo
 /// The whole file; nothing when it cannot be read (errno says why, ENOENT when there is none).
 std::optional<std::string> readFile(const std::filesystem::path& path);
 
+/// Whether the path leads to the opened file, and not to a link or to a file that took its place.
+bool isSameFile(int descriptor, const std::filesystem::path& path);
+
 /// Holds the lock of the state root, across threads and processes, while it lives. Read-modify-write
 /// of a stored file happens under it. A thread that holds it may take it again.
 class StateLock {

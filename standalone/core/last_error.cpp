@@ -47,6 +47,16 @@ void clearLastError() {
     lastError() = LastError();
 }
 
+struct LastErrorKept::Kept {
+    LastError error;
+};
+
+LastErrorKept::LastErrorKept() : kept_(std::make_unique<Kept>(Kept{lastError()})) {}
+
+LastErrorKept::~LastErrorKept() {
+    lastError() = std::move(kept_->error);
+}
+
 } // namespace velt
 
 int VLIBCErrGet(void) {

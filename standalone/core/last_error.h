@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_CORE_LAST_ERROR_H
 #define VELT_STANDALONE_CORE_LAST_ERROR_H
 
+#include <memory>
 #include <string>
 
 namespace velt {
@@ -41,6 +42,20 @@ const std::string& lastErrorSentence();
 
 /// Forgets the calling thread's last error.
 void clearLastError();
+
+/// Puts the calling thread's last error back as it was at the construction, when it goes: for work whose
+/// failures are not those of the operation that it belongs to. Stays on its thread.
+class LastErrorKept {
+public:
+    LastErrorKept();
+    ~LastErrorKept();
+    LastErrorKept(const LastErrorKept&) = delete;
+    LastErrorKept& operator=(const LastErrorKept&) = delete;
+
+private:
+    struct Kept;
+    std::unique_ptr<Kept> kept_;
+};
 
 } // namespace velt
 

@@ -1,5 +1,6 @@
 #include "standalone/events/event_file.h"
 
+#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/unique_fd.h"
@@ -7,6 +8,7 @@
 #include <fcntl.h>
 #include <json/json.h>
 #include <sys/file.h>
+#include <syslog.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -38,19 +40,55 @@ int failToWrite(const std::filesystem::path& path, const char* why) {
     return fail(ErrorNumber::event, "The event cannot be written to " + path.string() + ": " + why + ".");
 }
 
-/// A line that does not fit on the disk is taken back, or the next one would be lost with it. The lock keeps
-/// other writers from adding theirs in between.
-int writeLine(int fd, const std::string& line, const std::filesystem::path& path) {
-    if (flock(fd, LOCK_EX) != 0) {
-        return failToWrite(path, std::strerror(errno));
+/// The file under its lock, which keeps other writers from adding their lines in between. Opened anew for
+/// each line: another writer, or a program of the administrator's, may have renamed it meanwhile.
+UniqueFd openLocked(const std::filesystem::path& path) {
+    for (;;) {
+        UniqueFd fd(::open(path.c_str(), O_RDWR | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0640));
+        if (!fd) {
+            return fd;
+        }
+        while (::flock(fd.get(), LOCK_EX) != 0) {
+            if (errno != EINTR) {
+                return UniqueFd();
+            }
+        }
+        if (isSameFile(fd.get(), path)) {
+            return fd;
+        }
     }
-    const off_t before = lseek(fd, 0, SEEK_END);
-    const ssize_t written = write(fd, line.data(), line.size());
+}
+
+std::filesystem::path kept(const std::filesystem::path& path, int number) {
+    return path.string() + "." + std::to_string(number);
+}
+
+/// From the oldest on, so that a process which is killed on the way leaves a number free, and no event lost.
+/// Where a file cannot be put away, the newest grows on: a limit is worth less than an event.
+void rotate(const std::filesystem::path& path) {
+    for (int number = keptEventFiles - 1; number >= 0; --number) {
+        const std::filesystem::path from = number == 0 ? path : kept(path, number);
+        if (::rename(from.c_str(), kept(path, number + 1).c_str()) != 0 && errno != ENOENT) {
+            ::syslog(LOG_WARNING, "%s cannot be put away: %s", from.c_str(), std::strerror(errno));
+            return;
+        }
+    }
+}
+
+/// Half a line, as a crash of the machine leaves it, would take the next one with it.
+bool endsInALine(int fd, off_t size) {
+    char last = '\n';
+    return size == 0 || ::pread(fd, &last, 1, size - 1) != 1 || last == '\n';
+}
+
+/// A line that does not fit on the disk is taken back, or the next one would be lost with it.
+int writeLine(int fd, off_t size, const std::string& line, const std::filesystem::path& path) {
+    const ssize_t written = ::write(fd, line.data(), line.size());
     if (written == static_cast<ssize_t>(line.size())) {
         return 0;
     }
     const int error = written < 0 ? errno : ENOSPC;
-    if (before >= 0 && ftruncate(fd, before) != 0) {
+    if (::ftruncate(fd, size) != 0) {
         return failToWrite(path, "half a line is left in it");
     }
     return failToWrite(path, std::strerror(error));
@@ -83,9 +121,18 @@ int appendEvent(const SystemEvent& event) {
     }
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
-    // Opened anew each time, so that the lines that follow a rotation go to the new file.
-    const UniqueFd fd(::open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0640));
-    return fd ? writeLine(fd.get(), line, path) : failToWrite(path, std::strerror(errno));
+    UniqueFd fd = openLocked(path);
+    off_t size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
+    if (size > 0 && static_cast<std::size_t>(size) + line.size() > largestEventFile) {
+        rotate(path);
+        fd.reset(); // or the lock of a file that could not be put away would be waited for
+        fd = openLocked(path);
+        size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
+    }
+    if (size < 0) {
+        return failToWrite(path, std::strerror(errno));
+    }
+    return writeLine(fd.get(), size, endsInALine(fd.get(), size) ? line : "\n" + line, path);
 }
 
 } // namespace velt

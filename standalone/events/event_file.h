@@ -1,9 +1,11 @@
-// The file that keeps the system events: "/var/log/velt/events.jsonl" below the state root.
+// The files that keep the system events: "/var/log/velt/events.jsonl" below the state root, and beside it the
+// older ones, "events.jsonl.1" to "events.jsonl.4", the last of which are the oldest.
 #ifndef VELT_STANDALONE_EVENTS_EVENT_FILE_H
 #define VELT_STANDALONE_EVENTS_EVENT_FILE_H
 
 #include "standalone/standalone.h"
 
+#include <cstddef>
 #include <string>
 
 namespace velt {
@@ -12,8 +14,13 @@ namespace velt {
 /// U+FFFD.
 std::string renderEvent(const SystemEvent& event);
 
-/// Appends the event's line. Lines of several processes never mix, and the file may be renamed away at any
-/// time. Negative, with the last error set, when the line is longer than 64 KiB or cannot be written whole.
+/// The newest file is put among the older ones before it would grow beyond this.
+inline constexpr std::size_t largestEventFile = 4 * 1024 * 1024;
+inline constexpr int keptEventFiles = 4;
+
+/// Appends the event's line. Lines of several processes never mix, the file may be renamed away at any time,
+/// and a process that is killed at any moment leaves whole lines, of which none but the oldest file's are
+/// gone. Negative, with the last error set, when the line is longer than 64 KiB or cannot be written whole.
 int appendEvent(const SystemEvent& event);
 
 } // namespace velt

@@ -8,9 +8,10 @@
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/ruleset.h"
+#include "standalone/firewall/ruleset_generation.h"
 #include "standalone/settings/settings.h"
-#include "standalone/supervise/process_identity.h"
 
 #include <syslog.h>
 
@@ -20,16 +21,6 @@
 
 namespace velt {
 namespace {
-
-/// Stands while rules of ours are loaded, with the boot of the machine in which they were: below a state root
-/// other than "/" the file outlives a boot, the rules do not.
-std::filesystem::path loadedMark() {
-    return statePath("/run/velt/firewall.loaded");
-}
-
-bool rulesAreLoaded() {
-    return readFile(loadedMark()) == bootId();
-}
 
 /// For the administrator: why ports may be closed although we opened them.
 std::filesystem::path warningFile() {
@@ -80,6 +71,36 @@ bool mayTouchRules() {
     return statePath("/") == "/" || std::filesystem::exists(statePath("/etc/velt/firewall.conf"), ignored);
 }
 
+int removeRules(const std::string& script) {
+    const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
+    if (result.exitCode != 0) {
+        return failToLoad(result);
+    }
+    noteRemoved();
+    std::error_code ignored;
+    std::filesystem::remove(warningFile(), ignored);
+    return 0;
+}
+
+// Each start of a service comes here, and most change no port.
+int replaceRules(const std::string& script) {
+    if (rulesAreInForce(script)) {
+        return 0;
+    }
+    // Noted before it is done, since a note without rules does no harm.
+    if (noteLoading() < 0) {
+        return -1;
+    }
+    const auto before = rulesetGeneration();
+    const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
+    if (result.exitCode != 0) {
+        return failToLoad(result);
+    }
+    noteLoaded(script, before);
+    warnOfForeignTables();
+    return 0;
+}
+
 int loadRules() {
     if (!mayTouchRules()) {
         return 0;
@@ -91,8 +112,8 @@ int loadRules() {
     if (!firewall) {
         return -1;
     }
-    std::error_code ignored;
-    if (firewall->mode == FirewallMode::off && !rulesAreLoaded()) {
+    const bool off = firewall->mode == FirewallMode::off;
+    if (off && !rulesWereLoaded()) {
         return 0; // nothing to take away, and perhaps no right to do it
     }
     const auto ftp = loadFtpSettings();
@@ -100,22 +121,8 @@ int loadRules() {
     if (!ftp || !sftp) {
         return -1;
     }
-    // Before the rules, since a mark without rules does no harm.
-    if (firewall->mode != FirewallMode::off && replaceFile(loadedMark(), bootId(), 0644) < 0) {
-        return -1;
-    }
-    const ProcessResult result =
-        runProcess({"nft", "-f", "-"}, renderRuleset(*firewall, servicePorts(*ftp, *sftp)));
-    if (result.exitCode != 0) {
-        return failToLoad(result);
-    }
-    if (firewall->mode == FirewallMode::off) {
-        std::filesystem::remove(loadedMark(), ignored);
-        std::filesystem::remove(warningFile(), ignored);
-        return 0;
-    }
-    warnOfForeignTables();
-    return 0;
+    const std::string script = renderRuleset(*firewall, servicePorts(*ftp, *sftp));
+    return off ? removeRules(script) : replaceRules(script);
 }
 
 } // namespace

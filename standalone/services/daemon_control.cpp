@@ -6,6 +6,7 @@
 #include "standalone/core/unique_fd.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/services/service_backend.h"
+#include "standalone/services/start_failure.h"
 #include "standalone/settings/candidate.h"
 #include "standalone/settings/settings.h"
 
@@ -29,10 +30,6 @@ constexpr std::array<std::pair<std::string_view, Daemon>, 4> services{{
     {"sftp", Daemon::sftp},
 }};
 
-std::string nameOf(Daemon daemon) {
-    return daemon == Daemon::ftp ? "ftpd" : "sftp";
-}
-
 /// One operation on a daemon at a time, over all threads and processes. Not the lock of the settings: a start
 /// may take seconds, in which settings can be read and written.
 class OperationLock {
@@ -42,7 +39,7 @@ public:
         if (directory.empty()) {
             return;
         }
-        const std::filesystem::path file = directory / (nameOf(daemon) + ".operation");
+        const std::filesystem::path file = directory / (daemonName(daemon) + ".operation");
         descriptor_ = UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
         if (!descriptor_) {
             fail(ErrorNumber::store,
@@ -59,10 +56,6 @@ private:
     bool held_ = false;
 };
 
-bool ftpIsWanted(const FtpSettings& settings) {
-    return (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
-}
-
 /// What a stop for a restart needs to know of the stored settings.
 struct NextStart {
     bool wanted = false;  ///< false also when the settings cannot be read
@@ -75,7 +68,7 @@ NextStart nextStart(Daemon daemon, const ServiceState& now) {
     const auto portIsFree = [&now](int port) { return probePorts({port}, now.daemon.pid) >= 0; };
     if (daemon == Daemon::ftp) {
         const auto settings = loadFtpSettings();
-        if (!settings || !ftpIsWanted(*settings)) {
+        if (!settings || !enablesFtp(settings->record)) {
             return {};
         }
         return {true,
@@ -89,15 +82,55 @@ NextStart nextStart(Daemon daemon, const ServiceState& now) {
 }
 
 /// After a start or a stop with this result: the rules open the ports of what is enabled, which may have
-/// changed although no port did. A daemon that did what was asked of it has not failed because of them.
+/// changed although no port did.
 int followedByFirewall(int result) {
-    if (result >= 0 && VELTFwRuleHup() < 0) {
-        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    if (result >= 0) {
+        followWithFirewall();
     }
     return result;
 }
 
+/// Nothing, with the last error set, when the settings cannot be read.
+std::optional<bool> isEnabled(Daemon daemon) {
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        return settings ? std::optional(enablesFtp(settings->record)) : std::nullopt;
+    }
+    const auto settings = loadSftpSettings();
+    return settings ? std::optional(settings->enabled) : std::nullopt;
+}
+
+int startPlanned(Daemon daemon) {
+    const auto backend = makeServiceBackend(daemonName(daemon));
+    if (daemon == Daemon::ftp) {
+        const auto settings = loadFtpSettings();
+        if (!settings) {
+            return -1;
+        }
+        if (!enablesFtp(settings->record)) {
+            return backend->stop();
+        }
+    }
+    const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
+    if (!plan || backend->start(*plan) < 0) {
+        return -1;
+    }
+    removeFormerPlans(*plan);
+    return 0;
+}
+
 } // namespace
+
+void followWithFirewall() {
+    const LastErrorKept kept;
+    if (VELTFwRuleHup() < 0) {
+        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+    }
+}
+
+std::string daemonName(Daemon daemon) {
+    return daemon == Daemon::ftp ? "ftpd" : "sftp";
+}
 
 std::optional<Daemon> daemonOf(const char* service) {
     const std::string_view name = service == nullptr ? std::string_view() : service;
@@ -112,30 +145,16 @@ std::optional<Daemon> daemonOf(const char* service) {
 
 int startDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
-    if (!lock) {
-        return -1;
-    }
-    const auto backend = makeServiceBackend(nameOf(daemon));
-    if (daemon == Daemon::ftp) {
-        const auto settings = loadFtpSettings();
-        if (!settings) {
-            return -1;
-        }
-        if (!ftpIsWanted(*settings)) {
-            return followedByFirewall(backend->stop());
-        }
-    }
-    const auto plan = daemon == Daemon::ftp ? planFtpDaemon() : planSftpDaemon();
-    if (!plan || backend->start(*plan) < 0) {
-        return -1;
-    }
-    removeFormerPlans(*plan);
-    return followedByFirewall(0);
+    return lock ? followedByFirewall(noteOutcome(daemonName(daemon), startPlanned(daemon))) : -1;
 }
 
 int stopDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
-    return lock ? followedByFirewall(makeServiceBackend(nameOf(daemon))->stop()) : -1;
+    if (!lock) {
+        return -1;
+    }
+    const int result = makeServiceBackend(daemonName(daemon))->stop();
+    return followedByFirewall(result < 0 ? result : noteOutcome(daemonName(daemon), result));
 }
 
 int stopDaemonForRestart(Daemon daemon) {
@@ -143,10 +162,10 @@ int stopDaemonForRestart(Daemon daemon) {
     if (!lock) {
         return -1;
     }
-    const auto backend = makeServiceBackend(nameOf(daemon));
+    const auto backend = makeServiceBackend(daemonName(daemon));
     const NextStart next = nextStart(daemon, backend->state());
     if (!next.possible) {
-        return -1;
+        return noteOutcome(daemonName(daemon), -1);
     }
     // What is still wanted is started next, and the firewall follows that.
     const int result = backend->stop();
@@ -155,11 +174,35 @@ int stopDaemonForRestart(Daemon daemon) {
 
 int pauseDaemon(Daemon daemon) {
     const OperationLock lock(daemon);
-    return lock ? makeServiceBackend(nameOf(daemon))->pause() : -1;
+    return lock ? makeServiceBackend(daemonName(daemon))->pause() : -1;
+}
+
+bool lostItsSupervisor(const ServiceState& state) {
+    const bool wasAtWork = state.state == RunState::running || state.state == RunState::failed;
+    return wasAtWork && state.supervisor && !isAlive(state.supervisor);
+}
+
+int restoreDaemon(Daemon daemon) {
+    const OperationLock lock(daemon);
+    if (!lock) {
+        return -1;
+    }
+    // Somebody may have taken it in hand while the lock was waited for.
+    const ServiceState now = daemonState(daemon);
+    if (isServing(now) && !lostItsSupervisor(now)) {
+        return 0;
+    }
+    const auto enabled = isEnabled(daemon);
+    if (!enabled) {
+        return -1;
+    }
+    const std::string name = daemonName(daemon);
+    return followedByFirewall(
+        noteOutcome(name, *enabled ? startPlanned(daemon) : makeServiceBackend(name)->stop()));
 }
 
 ServiceState daemonState(Daemon daemon) {
-    return makeServiceBackend(nameOf(daemon))->state();
+    return makeServiceBackend(daemonName(daemon))->state();
 }
 
 } // namespace velt

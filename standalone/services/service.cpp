@@ -1,6 +1,5 @@
 #include "platform/service.h"
 
-#include "platform/firewall.h"
 #include "platform/sftp.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
@@ -15,6 +14,7 @@
 #include <syslog.h>
 
 #include <functional>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -60,23 +60,21 @@ int startOrStop(const char* service, bool wanted) {
 
 int startEnabledServices() {
     return atBoundary([] {
+        followWithFirewall(); // its rules went with the boot as well
         const auto ftp = loadFtpSettings();
-        const auto sftp = loadSftpSettings();
-        if (!ftp || !sftp) {
-            return -1;
-        }
-        // The firewall's rules went with the boot as well. Rules that miss do not keep the services down,
-        // just as they do not when a port changes.
-        if (VELTFwRuleHup() < 0) {
-            ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
-        }
-        const bool ftpWanted =
-            (ftp->record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
-        const int ftpResult = startOrStop("ftpd", ftpWanted);
+        const int ftpResult = ftp ? startOrStop("ftpd", enablesFtp(ftp->record)) : -1;
         if (ftpResult < 0) {
             ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
         }
-        const int sftpResult = startOrStop("sftp", sftp->enabled);
+        std::optional<LastErrorKept> first; // what the second has to say goes to the log only
+        if (ftpResult < 0) {
+            first.emplace();
+        }
+        const auto sftp = loadSftpSettings();
+        const int sftpResult = sftp ? startOrStop("sftp", sftp->enabled) : -1;
+        if (sftpResult < 0) {
+            ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+        }
         return ftpResult < 0 ? ftpResult : sftpResult;
     });
 }
@@ -84,6 +82,12 @@ int startEnabledServices() {
 ServiceState serviceState(const std::string& service) {
     const auto daemon = daemonOf(service.c_str());
     return daemon ? daemonState(*daemon) : ServiceState{};
+}
+
+std::uint64_t daemonRestarts(const std::string& service) {
+    const LastErrorKept kept;
+    const auto daemon = daemonOf(service.c_str());
+    return daemon ? daemonState(*daemon).restarts : 0;
 }
 
 } // namespace velt

@@ -9,11 +9,14 @@
 
 namespace velt {
 
-std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon) {
+bool systemdKeepsSupervisors() {
     // Units are the machine's, so an installation below another root keeps its daemons to itself.
     std::error_code error;
-    const bool systemdRuns = std::filesystem::is_directory("/run/systemd/system", error);
-    if (systemdRuns && statePath("/") == "/") {
+    return std::filesystem::is_directory("/run/systemd/system", error) && statePath("/") == "/";
+}
+
+std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon) {
+    if (systemdKeepsSupervisors()) {
         return std::make_unique<SuperviseBackend>(daemon, std::make_unique<SystemdLauncher>(daemon));
     }
     return std::make_unique<SuperviseBackend>(daemon);

@@ -31,6 +31,9 @@ public:
     virtual ServiceState state() const = 0;
 };
 
+/// Whether systemd starts a supervisor again that was killed.
+bool systemdKeepsSupervisors();
+
 /// The backend for the daemon "ftpd" or "sftp" on this machine.
 std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon);
 

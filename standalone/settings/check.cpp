@@ -73,6 +73,10 @@ int controlPort(const _tag_VELT_FTP_CONF_& record) {
     return plain && port >= 1 && port <= highestPort ? port : 0;
 }
 
+bool enablesFtp(const _tag_VELT_FTP_CONF_& record) {
+    return (record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
+}
+
 bool hasCustomPassiveRange(const _tag_VELT_FTP_CONF_& record) {
     return record.passive_port_min != 0 && record.passive_port_max != 0;
 }

@@ -7,6 +7,7 @@
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/settings/record_merge.h"
 #include "standalone/settings/settings_files.h"
 #include "standalone/settings/settings_store.h"
 
@@ -26,8 +27,37 @@ template<class Value> int writeSetting(Value FtpSettings::*setting, Value value)
         [&] { return changeFtpSettings([&](FtpSettings& settings) { settings.*setting = value; }); });
 }
 
+LastSeen<_tag_VELT_FTP_CONF_>& lastSeenRecord() {
+    thread_local LastSeen<_tag_VELT_FTP_CONF_> seen;
+    return seen;
+}
+
+int readRecord(_tag_VELT_FTP_CONF_& record) {
+    lastSeenRecord().forget();
+    const auto settings = loadFtpFile();
+    if (!settings)
+        return -1;
+    record = settings->record;
+    lastSeenRecord().note(record);
+    return 0;
+}
+
+int storeRecord(const _tag_VELT_FTP_CONF_& record) {
+    const int result = changeFtpSettings([&record](FtpSettings& settings) {
+        settings.record = lastSeenRecord().merge(settings.record, record);
+    });
+    // Not what was stored in the end: the caller goes on with its own copy.
+    if (result >= 0)
+        lastSeenRecord().note(record);
+    return result;
+}
+
 int noPlaceFor(const char* what) {
     return fail(ErrorNumber::invalid, std::string("There is no place for ") + what + ".");
+}
+
+bool isBlank(std::string_view text) {
+    return text.find_first_not_of(" \t") == std::string_view::npos;
 }
 
 int writeSystemInformation(std::string_view key, std::string_view value) {
@@ -45,17 +75,11 @@ int writeSystemInformation(std::string_view key, std::string_view value) {
 int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out) {
     if (out == nullptr)
         return velt::noPlaceFor("the FTP settings");
-    return velt::atBoundary([&] {
-        const auto settings = velt::loadFtpFile();
-        if (!settings)
-            return -1;
-        *out = settings->record;
-        return 0;
-    });
+    return velt::atBoundary([out] { return velt::readRecord(*out); });
 }
 
 int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf) {
-    return velt::writeSetting(&velt::FtpSettings::record, conf);
+    return velt::atBoundary([&conf] { return velt::storeRecord(conf); });
 }
 
 int VELTFTPTimeOutGet(void) {
@@ -109,8 +133,9 @@ int VLIBCINFOSetKeyValue(const char* key, const char* value) {
     if (key == nullptr || value == nullptr)
         return velt::fail(velt::ErrorNumber::invalid, "There is no key or no value to write.");
     return velt::atBoundary([&] {
+        // A blank stands for no address: whoever may not write an empty text can still take the address away.
         if (key == velt::externalAddressKey)
-            return velt::changeExternalAddress(value);
+            return velt::changeExternalAddress(velt::isBlank(value) ? "" : value);
         return velt::writeSystemInformation(key, value);
     });
 }

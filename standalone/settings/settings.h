@@ -39,6 +39,9 @@ int writeMissingSettings();
 /// The control port of the record; 0 when its text is no decimal number of 1 to 65535.
 int controlPort(const _tag_VELT_FTP_CONF_& record);
 
+/// Whether the record enables FTP or FTPS.
+bool enablesFtp(const _tag_VELT_FTP_CONF_& record);
+
 /// Whether the record has a custom passive range in force.
 bool hasCustomPassiveRange(const _tag_VELT_FTP_CONF_& record);
 

@@ -52,8 +52,7 @@ int storeSftpFile(const SftpSettings& settings) {
 // that switch a service off, or are changed while it is off, must not fail for the want of these; switching
 // it on tests them all.
 int testIfOn(const FtpSettings& settings) {
-    const bool on = (settings.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
-    return on ? testFtpCandidate(settings) : 0;
+    return enablesFtp(settings.record) ? testFtpCandidate(settings) : 0;
 }
 
 int testIfOn(const SftpSettings& settings) {

@@ -70,6 +70,8 @@ void takeLine(const std::string& line, ServiceState& state) {
         int port = 0;
         fields >> port;
         state.ports.push_back(port);
+    } else if (key == "restarts") {
+        fields >> state.restarts;
     } else if (key == "configuration") {
         std::getline(fields, state.configurationHash);
     } else if (key == "reason") {
@@ -88,6 +90,7 @@ std::string render(const ServiceState& state) {
     processLine("supervisor", state.supervisor);
     processLine("daemon", state.daemon);
     text << "configuration " << oneLine(state.configurationHash) << '\n';
+    text << "restarts " << state.restarts << '\n';
     for (const int port : state.ports) {
         text << "port " << port << '\n';
     }

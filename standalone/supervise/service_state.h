@@ -4,6 +4,7 @@
 
 #include "standalone/supervise/process_identity.h"
 
+#include <cstdint>
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -20,12 +21,13 @@ enum class RunState {
 
 struct ServiceState {
     RunState state = RunState::stopped;
-    ProcessId supervisor;
+    ProcessId supervisor;            ///< none when it ended after a failed start
     ProcessId daemon;                ///< none while paused or failed
     std::string configurationHash;   ///< what the daemon was started for
     std::vector<int> ports;          ///< on which the daemon listens
     std::vector<ProcessId> sessions; ///< those seen when the file was written
     std::string reason;              ///< of a failure, one line
+    std::uint64_t restarts = 0;      ///< of the daemon, after it had ended by itself
 };
 
 /// The files of a service in the folder that holds all of them.

@@ -89,6 +89,8 @@ std::string Supervisor::begin(const DaemonOrder& order) {
     if (!reason.empty()) {
         control_.reset();
         endProcesses([] { return descendantsOf(::getpid()); }, patience);
+        finished_ = true;
+        publish(RunState::failed, reason);
     }
     return reason;
 }
@@ -233,6 +235,7 @@ void Supervisor::onDaemonEnd(int waitStatus) {
 }
 
 void Supervisor::restartDaemon() {
+    ++restarts_;
     const std::string reason = startDaemon(Clock::now() + startLimit);
     if (!reason.empty()) {
         ::syslog(LOG_ERR, "the daemon of %s does not start: %s", service_.c_str(), reason.c_str());
@@ -253,10 +256,13 @@ void Supervisor::publish(RunState state, std::string reason) {
     state_ = state;
     ServiceState record;
     record.state = state;
-    record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+    if (!finished_) { // who is named there and gone was killed
+        record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+    }
     record.daemon = daemon_.id();
     record.configurationHash = order_.configurationHash;
     record.ports = order_.ports;
+    record.restarts = restarts_;
     record.sessions = descendantsOf(::getpid());
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);

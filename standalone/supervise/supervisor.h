@@ -7,6 +7,7 @@
 #include "standalone/supervise/service_state.h"
 
 #include <chrono>
+#include <cstdint>
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -59,6 +60,7 @@ private:
     RunState state_ = RunState::stopped;
     Clock::time_point startedAt_;
     std::chrono::milliseconds backOff_;
+    std::uint64_t restarts_ = 0; ///< after the daemon had ended by itself
     std::optional<Clock::time_point> restartAt_;
     bool finished_ = false;
 };

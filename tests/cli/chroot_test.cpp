@@ -84,7 +84,14 @@ TEST_F(ChrootTest, ARuleOfAnUnknownUserIsTold) {
     const RunResult result = run({"chroot", "rules", "add", "user", "nobody-knows", "/docs"});
     EXPECT_EQ(result.code, 3);
     EXPECT_NE(result.err.find("left out: user nobody-knows /docs"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("as they were before"), std::string::npos) << result.err;
     EXPECT_EQ(host.rules.size(), 2U);
+    EXPECT_EQ(
+        run({"chroot", "rules", "save", "-"},
+            R"([{"type": "user", "name": "ben", "path": "/home"}, {"type": "user", "name": "x", "path": "/home"}])")
+            .code,
+        3);
+    EXPECT_EQ(jsonOf(run({"chroot", "rules", "load", "--json"}).out)["rules"][0]["name"], "anna");
 }
 
 TEST_F(ChrootTest, ARuleThatTheServerWouldMisreadIsNotSent) {

@@ -90,13 +90,46 @@ TEST_F(DocumentTest, APassiveRangeGoesWithItsSwitch) {
     EXPECT_EQ(host.ftp["custom_port"], "7000:7010");
 }
 
-TEST_F(DocumentTest, AnAddressThatCannotBeClearedIsTold) {
+TEST_F(DocumentTest, AnAddressIsTakenAwayAgain) {
     const Json::Value document = exported();
     host.ftp["ext_ip"] = "192.0.2.1";
     const RunResult result = import(document);
     EXPECT_EQ(result.code, 0);
-    EXPECT_EQ(result.out, "Nothing to change.\n");
-    EXPECT_NE(result.err.find("warning: ftp.ext_ip stays 192.0.2.1"), std::string::npos) << result.err;
+    EXPECT_EQ(result.out, "ftp  ext_ip: 192.0.2.1 -> (empty)\n");
+    EXPECT_EQ(exported(), document);
+}
+
+TEST_F(DocumentTest, AServiceThatIsDownIsExportedAsSwitchedOn) {
+    host.down = {"sftp", "ftps"};
+    const Json::Value document = exported();
+    EXPECT_EQ(document["sftp"]["enable"], true);
+    EXPECT_EQ(document["ftp"]["enable_ftps"], true);
+    EXPECT_EQ(import(document).out, "Nothing to change.\n");
+}
+
+TEST_F(DocumentTest, ARangeOverTheFormerControlPortComesAfterThePortHasMoved) {
+    Json::Value document = exported();
+    host.ftp["portnum"] = 2121;
+    document["ftp"]["portnum"] = 2001;
+    document["ftp"]["custom_port_range"] = true;
+    document["ftp"]["custom_port"] = "2100:2200";
+    EXPECT_EQ(import(document).code, 0);
+    ASSERT_EQ(sent(ftpSet).size(), 2U);
+    EXPECT_EQ(sent(ftpSet)[0]["portnum"], 2001);
+    EXPECT_EQ(sent(ftpSet)[0]["custom_port_range"], false);
+    EXPECT_EQ(sent(ftpSet)[1]["custom_port"], "2100:2200");
+    EXPECT_EQ(exported(), document);
+}
+
+TEST_F(DocumentTest, SftpGivesUpAPortBeforeFtpTakesIt) {
+    Json::Value document = exported();
+    document["ftp"]["portnum"] = 22;
+    document["sftp"]["portnum"] = 2222;
+    EXPECT_EQ(import(document).out, "sftp  portnum: 22 -> 2222\nftp  portnum: 21 -> 22\n");
+    document["ftp"]["custom_port_range"] = true;
+    document["ftp"]["custom_port"] = "2000:2300";
+    document["sftp"]["portnum"] = 2400;
+    EXPECT_EQ(import(document).out.substr(0, 4), "sftp");
 }
 
 TEST_F(DocumentTest, ADryRunChangesNothing) {

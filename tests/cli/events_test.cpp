@@ -94,6 +94,17 @@ TEST_F(EventsTest, EachKindIsDescribedOnOneLine) {
     }
 }
 
+TEST_F(EventsTest, OneKindIsShownAlone) {
+    answer(true);
+    RunResult result = run({"events", "--count", "1", "--kind", "log"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    EXPECT_NE(result.out.find("  log  0x11B00002"), std::string::npos) << result.out;
+    EXPECT_EQ(result.out.find("service"), std::string::npos) << result.out;
+    result = run({"events", "--count", "2", "--kind", "log,request"});
+    EXPECT_NE(result.out.find("  request  "), std::string::npos) << result.out;
+    EXPECT_EQ(run({"events", "--kind", "other"}).code, 2);
+}
+
 TEST_F(EventsTest, ProgramsGetOneObjectPerLine) {
     answer(true);
     const RunResult result = run({"events", "--count", "1", "--json"});

@@ -65,6 +65,9 @@ TEST_F(ExitCodesTest, ThePlatformFailed) {
     EXPECT_NE(last.err.find("request id r-1"), std::string::npos);
     EXPECT_NE(last.err.find("may be in effect"), std::string::npos);
     EXPECT_EQ(codeAfter(503), 5);
+    host.answerWith(ftpSet, problemReply(500, R"({"title": "Failed", "changed": false})"));
+    EXPECT_EQ(codeOf({"ftp", "set", "portnum=2121"}), 5);
+    EXPECT_EQ(last.err.find("may be in effect"), std::string::npos) << last.err;
 }
 
 TEST_F(ExitCodesTest, NoConnectionOrAccess) {

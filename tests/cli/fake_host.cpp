@@ -14,6 +14,13 @@ HttpReply jsonReply(const Json::Value& value) {
     return reply;
 }
 
+std::string ifMatchOf(const HttpRequest& request) {
+    const std::size_t begin = request.head.find("If-Match: ");
+    return begin == std::string::npos
+               ? ""
+               : request.head.substr(begin + 10, request.head.find('\r', begin) - begin - 10);
+}
+
 HttpReply noContent() {
     HttpReply reply;
     reply.status = 204;
@@ -71,14 +78,28 @@ HttpReply FakeHost::handle(const HttpRequest& request) {
     if (scripted != scripted_.end()) {
         return scripted->second;
     }
+    if (outdated > 0 && request.method == "POST" && !etag.empty()) {
+        --outdated;
+        conditions.push_back(ifMatchOf(request));
+        ftp["enable_ftps"] = true;
+        return problemReply(412, R"({"title": "Precondition Failed"})");
+    }
     if (request.method != "GET" && request.method != "POST") {
         return problemReply(405, R"({"title": "Method not allowed"})");
     }
-    return callMethod(request.target,
-                      request.body.empty() ? Json::Value(Json::objectValue) : jsonOf(request.body));
+    if (request.method == "POST" && !etag.empty()) {
+        conditions.push_back(ifMatchOf(request));
+    }
+    HttpReply reply = callMethod(request.target, request.body.empty() ? Json::Value(Json::objectValue)
+                                                                      : jsonOf(request.body));
+    reply.etag = etag;
+    return reply;
 }
 
 HttpReply FakeHost::callMethod(const std::string& row, const Json::Value& parameters) {
+    if (row == "/api/status") {
+        return jsonReply(status());
+    }
     const std::string api = "/api/VELT.Core.FileServ.FTP";
     const std::set<std::string> ftpRequired = {"enable_ftp", "enable_ftps"};
     if (row == api + "/v3/get" || row == api + "/v2/get" || row == api + "/v1/get") {
@@ -108,6 +129,20 @@ HttpReply FakeHost::callMethod(const std::string& row, const Json::Value& parame
     return problemReply(404, R"({"title": "No such method", "detail": "The server has no such row."})");
 }
 
+Json::Value FakeHost::status() const {
+    Json::Value answer = jsonOf(R"({"version": "1.0.0", "uptime_seconds": 1})");
+    for (const std::string name : {"ftp", "ftps", "sftp"}) {
+        Json::Value service;
+        service["name"] = name;
+        service["enabled"] = name == "sftp" ? sftp["enable"] : ftp["enable_" + name];
+        if (tellsWanted) {
+            service["wanted"] = down.count(name) != 0 || service["enabled"].asBool();
+        }
+        answer["services"].append(service);
+    }
+    return answer;
+}
+
 HttpReply FakeHost::set(Json::Value& settings, const Json::Value& parameters,
                         const std::set<std::string>& required) {
     for (const std::string& key : required) {
@@ -124,7 +159,7 @@ HttpReply FakeHost::set(Json::Value& settings, const Json::Value& parameters,
     }
     for (const std::string& key : parameters.getMemberNames()) {
         if (key != "custom_port" || ranged) {
-            settings[key] = parameters[key];
+            settings[key] = parameters[key] == " " ? Json::Value("") : parameters[key];
         }
     }
     return noContent();

@@ -10,6 +10,7 @@
 #include <map>
 #include <set>
 #include <string>
+#include <vector>
 
 class FakeHost {
 public:
@@ -28,10 +29,16 @@ public:
     Json::Value rules{Json::arrayValue};
     Json::Value chrootUsers{Json::arrayValue};
     std::set<std::string> accounts{"anna", "ben", "staff"};
+    std::set<std::string> down; ///< services that are shown as off and are switched on: ftp, ftps, sftp
+    std::string etag;           ///< of every answer; empty for none
+    int outdated = 0;           ///< so many sets of the FTP settings come too late
+    std::vector<std::string> conditions; ///< their If-Match
+    bool tellsWanted = true;             ///< the status says what is switched on
 
 private:
     HttpReply set(Json::Value& settings, const Json::Value& parameters,
                   const std::set<std::string>& required);
+    Json::Value status() const;
     HttpReply saveRules(const Json::Value& parameters);
     HttpReply callMethod(const std::string& row, const Json::Value& parameters);
 

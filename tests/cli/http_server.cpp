@@ -144,6 +144,9 @@ void HttpServer::answer(int connection) {
     }
     std::string text = "HTTP/1.1 " + std::to_string(reply.status) + " Status\r\nConnection: close\r\n";
     text += "Content-Type: " + reply.contentType + "\r\n";
+    if (!reply.etag.empty()) {
+        text += "ETag: " + reply.etag + "\r\n";
+    }
     if (!reply.stream && reply.status != 204) {
         text += "Content-Length: " + std::to_string(reply.body.size()) + "\r\n";
     }

@@ -21,6 +21,7 @@ struct HttpReply {
     std::string contentType = "application/json";
     bool stream = false; ///< no length, and the connection stays open until the client or the server leaves
     bool drop = false;   ///< no answer at all
+    std::string etag{};  ///< empty: no such header
 };
 
 class HttpServer {

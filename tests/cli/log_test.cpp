@@ -74,5 +74,8 @@ TEST_F(LogTest, ATimeThatIsNoneIsAUsageError) {
         EXPECT_EQ(run({"log", std::string("--since=") + time}).code, 2) << time;
     }
     EXPECT_EQ(run({"log", "--limit", "0"}).code, 2);
+    EXPECT_EQ(run({"log", "--limit", "1001"}).code, 2);
+    EXPECT_EQ(run({"log", "--follow", "--all"}).code, 2);
+    EXPECT_EQ(run({"log", "--follow", "--before", "5"}).code, 2);
     EXPECT_TRUE(asked().empty());
 }

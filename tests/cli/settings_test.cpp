@@ -32,12 +32,76 @@ TEST_F(SettingsTest, OneFtpSettingIsChangedAloneBesideTheRequiredKeys) {
     EXPECT_EQ(result.out, "timeout: 300 -> -5\n");
     ASSERT_EQ(sent(ftpSet).size(), 1U);
     EXPECT_EQ(sent(ftpSet)[0], jsonOf(R"({"enable_ftp": true, "enable_ftps": false, "timeout": -5})"));
-    EXPECT_EQ(asked(), (std::vector<std::string>{ftpGet, ftpSet, ftpGet}));
+    EXPECT_EQ(asked(), (std::vector<std::string>{ftpGet, "GET /api/status", ftpSet, ftpGet}));
 }
 
 TEST_F(SettingsTest, OneSftpSettingIsChangedAlone) {
     EXPECT_EQ(run({"sftp", "set", "portnum=2222"}).out, "portnum: 22 -> 2222\n");
     EXPECT_EQ(sent(sftpSet).at(0), jsonOf(R"({"enable": false, "portnum": 2222})"));
+}
+
+TEST_F(SettingsTest, AServiceThatIsDownStaysSwitchedOn) {
+    host.down = {"ftps", "sftp"};
+    RunResult result = run({"sftp", "set", "portnum=2222"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    EXPECT_EQ(sent(sftpSet).at(0), jsonOf(R"({"enable": true, "portnum": 2222})"));
+    result = run({"ftp", "set", "timeout=5"});
+    EXPECT_EQ(sent(ftpSet).at(0), jsonOf(R"({"enable_ftp": true, "enable_ftps": true, "timeout": 5})"));
+    EXPECT_EQ(result.err, "");
+}
+
+TEST_F(SettingsTest, WhereASwitchIsNotKnownItIsToldWhatWasSent) {
+    host.tellsWanted = false;
+    const RunResult result = run({"sftp", "set", "portnum=2222"});
+    EXPECT_EQ(result.code, 0);
+    EXPECT_EQ(result.out, "portnum: 22 -> 2222\n");
+    EXPECT_NE(result.err.find("warning: enable was sent as off"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("name enable=on"), std::string::npos) << result.err;
+    EXPECT_EQ(run({"sftp", "set", "portnum=2223", "enable=off"}).err, "") << "the user said so";
+    host.answerWith("GET /api/status", problemReply(404, "{}"));
+    EXPECT_NE(run({"ftp", "set", "timeout=5"}).err.find("enable_ftps was sent as off"), std::string::npos);
+    EXPECT_EQ(sent(ftpSet).at(0), jsonOf(R"({"enable_ftp": true, "enable_ftps": false, "timeout": 5})"));
+}
+
+TEST_F(SettingsTest, NamedSwitchesNeedNoStatus) {
+    EXPECT_EQ(run({"sftp", "set", "enable=on"}).code, 0);
+    for (const std::string& request : asked()) {
+        EXPECT_NE(request, "GET /api/status");
+    }
+}
+
+TEST_F(SettingsTest, TheExternalAddressCanBeTakenAway) {
+    host.ftp["ext_ip"] = "192.0.2.1";
+    const RunResult result = run({"ftp", "set", "ext_ip="});
+    EXPECT_EQ(result.out, "ext_ip: 192.0.2.1 -> (empty)\n");
+    EXPECT_EQ(result.err, "");
+    EXPECT_EQ(sent(ftpSet).at(0)["ext_ip"], " ") << "the server refuses an empty text";
+}
+
+TEST_F(SettingsTest, AnEmptyRangeIsNone) {
+    const RunResult result = run({"ftp", "set", "custom_port="});
+    EXPECT_EQ(result.code, 2);
+    EXPECT_NE(result.err.find("custom_port_range=off"), std::string::npos) << result.err;
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(SettingsTest, AChangeInBetweenIsBuiltUpon) {
+    host.etag = "\"a-1\"";
+    host.outdated = 1; // enable_ftps is switched on by somebody else before the first set
+    const RunResult result = run({"ftp", "set", "timeout=5"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    ASSERT_EQ(sent(ftpSet).size(), 2U);
+    EXPECT_EQ(sent(ftpSet)[1], jsonOf(R"({"enable_ftp": true, "enable_ftps": true, "timeout": 5})"));
+    EXPECT_EQ(host.ftp["enable_ftps"], true);
+    EXPECT_EQ(host.conditions, (std::vector<std::string>{"\"a-1\"", "\"a-1\""}));
+}
+
+TEST_F(SettingsTest, ChangesWithoutEndInBetweenAreAConflict) {
+    host.etag = "\"a-1\"";
+    host.outdated = 1000;
+    const RunResult result = run({"ftp", "set", "timeout=5"});
+    EXPECT_EQ(result.code, 4);
+    EXPECT_EQ(host.ftp["timeout"], 300);
 }
 
 TEST_F(SettingsTest, SecurityNeedsNoOtherKey) {

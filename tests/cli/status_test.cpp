@@ -26,6 +26,28 @@ TEST_F(StatusTest, TheServicesAreShown) {
                           "sftp     on     2222\n");
 }
 
+TEST_F(StatusTest, AServiceThatIsSwitchedOnAndDoesNotRunIsDown) {
+    answer(R"({"version": "1.0.0", "uptime_seconds": 1, "services": [
+        {"name": "ftp", "enabled": true, "wanted": true, "running": false, "port": 21, "reason": "No luck."},
+        {"name": "ftps", "enabled": true, "wanted": true, "running": false, "port": 21, "reason": "No luck."},
+        {"name": "sftp", "enabled": false, "wanted": true, "running": false, "port": 22, "reason": "Paused."}]})");
+    EXPECT_EQ(run({"status"}).out, "veltd 1.0.0, up for 1 s\n\n"
+                                   "SERVICE  STATE  PORT\n"
+                                   "ftp      down   21\n"
+                                   "ftps     down   21\n"
+                                   "sftp     down   22\n"
+                                   "\nftp: No luck.\n"
+                                   "\nsftp: Paused.\n");
+    answer(R"({"version": "1.0.0", "uptime_seconds": 1, "services": [
+        {"name": "ftp", "enabled": false, "wanted": false, "running": false, "port": 21},
+        {"name": "sftp", "enabled": true, "wanted": true, "running": true, "port": 22, "reason": "Refused."}]})");
+    EXPECT_EQ(run({"status"}).out, "veltd 1.0.0, up for 1 s\n\n"
+                                   "SERVICE  STATE  PORT\n"
+                                   "ftp      off    21\n"
+                                   "sftp     on     22\n"
+                                   "\nsftp: Refused.\n");
+}
+
 TEST_F(StatusTest, ProgramsGetTheServersObject) {
     answer(status);
     EXPECT_EQ(jsonOf(run({"status", "--json"}).out), jsonOf(status));

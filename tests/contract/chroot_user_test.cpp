@@ -99,5 +99,28 @@ TEST_F(ChrootUserContract, ListsAreNarrowedToADomain) {
     }
 }
 
+TEST_F(ChrootUserContract, TheLetterCaseOfASubstringDoesNotCount) {
+    change(VELTFTPAddChrootUser, {"ben"});
+    EXPECT_EQ(listed(VELTFTPChrootUserEnum, local, "BE"), NameSet{"ben"});
+    EXPECT_EQ(listed(VELTFTPNonChrootUserEnum, local, "eA"), NameSet{"bea"});
+}
+
+TEST_F(ChrootUserContract, AnUnknownNameIsRefusedAndChangesNobody) {
+    change(VELTFTPAddChrootUser, {"ben"});
+    List unknown({"ann", "nobody-like-this"});
+    EXPECT_LT(VELTFTPAddChrootUser(unknown.get()), 0);
+    List alsoUnknown({"ben", "nobody-like-this"});
+    EXPECT_LT(VELTFTPDeleteChrootUser(alsoUnknown.get()), 0);
+    EXPECT_EQ(chrootUsers(), NameSet{"ben"});
+}
+
+TEST_F(ChrootUserContract, ASystemAccountCanBeOne) {
+    change(VELTFTPAddChrootUser, {"ftp"});
+    EXPECT_EQ(chrootUsers(), NameSet{"ftp"});
+    EXPECT_EQ(otherUsers(), (NameSet{"ann", "bea", "ben"}));
+    change(VELTFTPDeleteChrootUser, {"ftp"});
+    EXPECT_EQ(chrootUsers(), NameSet());
+}
+
 } // namespace
 } // namespace contract

@@ -20,6 +20,7 @@ void prepare(const World& world) {
     platform.pushMovesList = true;
     platform.hashMoves = true;
     platform.enumeratorsReplaceList = true;
+    platform.unknownUsersAreRefused = true;
     for (const User& user : world.users) {
         platform.users[user.name] = {user.description, user.uid, fake::sourceLocal, ""};
         if (user.isPerson) {

@@ -65,6 +65,13 @@ TEST_F(KeyValueContract, ALongerValueIsCut) {
     EXPECT_EQ(read("ftp_ext_ip", 1), "");
 }
 
+TEST_F(KeyValueContract, AFileThatIsNotThereHasNoKeys) {
+    std::array<char, 8> buffer{};
+    EXPECT_EQ(read("model"), std::nullopt) << "nothing was written yet";
+    EXPECT_EQ(VLIBCFileGetKeyValue("/etc/no-such-file.conf", "model", buffer.data(), 8, 0), 0);
+    EXPECT_EQ(VLIBCFileGetKeyValue("/no-such-folder/file.conf", "model", buffer.data(), 8, 0), 0);
+}
+
 TEST_F(KeyValueContract, WhatCannotBeReadOrWrittenFails) {
     write("model", "one");
     std::array<char, 8> buffer{};

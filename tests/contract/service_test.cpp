@@ -41,5 +41,18 @@ TEST_F(ServiceContract, TheSftpFlagEnablesSftp) {
     }
 }
 
+TEST_F(ServiceContract, NeitherAStopNorARunKeyChangesWhatIsEnabled) {
+    storeFlags(VELT_FTP_SERVICE_PLAIN);
+    ASSERT_GE(VELTSFTPConfigSet(1, 2222), 0) << lastError();
+    ASSERT_GE(VLIBServicecfgRunKeySet("ftpd", 2), 0) << lastError();
+    ASSERT_GE(VLIBServicecfgRunKeySet("ftpd-ssl", 1), 0) << lastError();
+    ASSERT_GE(VLIBServicectlStop("ftpd", 0), 0) << lastError();
+    ASSERT_GE(VLIBServiceStop("sftp", 0), 0) << lastError();
+    EXPECT_TRUE(isEnabled("ftpd"));
+    EXPECT_FALSE(isEnabled("ftpd-ssl"));
+    EXPECT_TRUE(isEnabled("sftp"));
+    EXPECT_EQ(VELTSFTPIsAlive(), 0);
+}
+
 } // namespace
 } // namespace contract

@@ -12,6 +12,7 @@
 #include <chrono>
 #include <fstream>
 #include <iterator>
+#include <sstream>
 #include <thread>
 
 namespace {
@@ -76,6 +77,54 @@ TEST_F(HostAccess, ABodyTooLargeWithoutATokenIs401) {
     Client client = connect();
     EXPECT_EQ(client.ask("POST /api HTTP/1.1\r\nHost: localhost\r\nContent-Length: 99999999\r\n\r\n").status,
               401);
+}
+
+TEST_F(HostAccess, ARequestThatIsWrongInItselfIs401WithoutAToken) {
+    start();
+    const std::string host = "Host: localhost\r\n";
+    for (const std::string& text : std::vector<std::string>{
+             "CONNECT localhost:22 HTTP/1.1\r\n" + host + "\r\n",
+             "OPTIONS * HTTP/1.1\r\n" + host + "\r\n",
+             "TRACE /api HTTP/1.1\r\n" + host + "\r\n",
+             "HEAD /api HTTP/1.1\r\n" + host + "\r\n",
+             "GET http://localhost/healthz HTTP/1.1\r\n" + host + "\r\n",
+             "GET /%zz HTTP/1.1\r\n" + host + "\r\n",
+             "GET /../../etc/passwd HTTP/1.1\r\n" + host + "\r\n",
+             "GET /healthz HTTP/1.1\r\n\r\n",
+             "GET /healthz HTTP/1.1\r\n" + host + host + "\r\n",
+             "GET /healthz HTTP/1.1\r\nHost: evil.example\r\n\r\n",
+             "GET /healthz HTTP/1.1\r\nOrigin: http://evil.example\r\n" + host + "\r\n",
+             "POST " + sftp + "set HTTP/1.1\r\nTransfer-Encoding: gzip\r\n" + host + "\r\n",
+             "POST " + sftp + "set HTTP/1.1\r\nTransfer-Encoding: chunked\r\n" + host + "\r\nnone\r\n",
+             "POST " + sftp + "set HTTP/1.1\r\nContent-Length: 99999999\r\nExpect: 100-continue\r\n" + host +
+                 "\r\n",
+             requestText("POST", sftp + "set", "Content-Type: text/plain\r\n", "{\"enable\":"),
+             "GET /healthz HTTP/1.0\r\n" + host + "\r\n",
+         }) {
+        Client client = connect();
+        client.send(text);
+        const Answer answer = client.receive(!text.starts_with("HEAD"));
+        EXPECT_EQ(answer.status, 401) << text;
+        EXPECT_EQ(answer.header("connection"), "close") << text;
+    }
+}
+
+TEST_F(HostAccess, WhatFollowsARefusedRequestIsNotServed) {
+    start();
+    Client client = connect();
+    client.send(requestText("GET", "/healthz") +
+                requestText("POST", sftp + "set", admin, R"({"enable":true})"));
+    EXPECT_EQ(client.receive().status, 401);
+    EXPECT_EQ(client.receive().status, 0);
+    EXPECT_EQ(fake::Platform::instance().count("VELTSFTPConfigSet"), 0);
+}
+
+TEST_F(HostAccess, EachRequestOfAConnectionShowsItsToken) {
+    start();
+    Client client = connect();
+    EXPECT_EQ(client.ask(requestText("GET", "/healthz", admin)).status, 200);
+    EXPECT_EQ(client.ask(requestText("GET", "/healthz")).status, 401);
+    EXPECT_TRUE(client.ended());
 }
 
 TEST_F(HostAccess, WrongTokensAreRefusedAndLogged) {
@@ -205,6 +254,20 @@ TEST_F(HostAccess, TokensAreListedMadeAndRemoved) {
     EXPECT_EQ(ask("DELETE", "/api/tokens/" + token["id"].asString(), admin).status, 404);
 }
 
+TEST_F(HostAccess, OnlyATokensOwnPathRemovesIt) {
+    start();
+    const std::string id = post("/api/tokens", R"({"name":"bench","role":"viewer"})").json()["id"].asString();
+    const std::string path = "/api/tokens/";
+    for (const std::string& target : {path + "a/" + id, path + id + "/", path + "/" + id, path + "a%2F" + id,
+                                      path + "../tokens/" + id, path, path + id + "%00", path + "*"}) {
+        EXPECT_EQ(ask("DELETE", target, admin).status, 404) << target;
+    }
+    EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 3U);
+    std::ostringstream escaped;
+    escaped << path << '%' << std::hex << static_cast<int>(id[0]) << id.substr(1);
+    EXPECT_EQ(ask("DELETE", escaped.str(), admin).status, 204) << escaped.str();
+}
+
 TEST_F(HostAccess, ATokenNeedsANameAndARole) {
     start();
     for (const char* body :
@@ -243,6 +306,9 @@ TEST_F(HostAccess, ADamagedTokenFileStopsTheStart) {
         std::ofstream(settings.tokenFile) << text;
         EXPECT_THROW(start(), velt::host::TokenError) << text;
     }
+    std::filesystem::remove(settings.tokenFile);
+    std::filesystem::create_directories(settings.tokenFile);
+    EXPECT_THROW(start(), velt::host::TokenError) << "a folder";
 }
 
 TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
@@ -250,7 +316,10 @@ TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
     const auto parent = settings.tokenFile.parent_path();
     std::filesystem::remove_all(parent);
     std::ofstream(parent) << "in the way";
-    EXPECT_EQ(post("/api/tokens", R"({"name":"x","role":"admin"})").status, 500);
+    const Answer answer = post("/api/tokens", R"({"name":"x","role":"admin"})");
+    EXPECT_EQ(answer.status, 500);
+    EXPECT_EQ(answer.json()["detail"],
+              "The file of tokens " + settings.tokenFile.string() + " cannot be written: Not a directory.");
     EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
 }
 

@@ -2,6 +2,7 @@
 
 #include "host/admin_log_json.h"
 #include "host/clock.h"
+#include "host/event_hub.h"
 #include "tests/host/fake_access.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -104,10 +105,35 @@ TEST_F(HostEndpoints, TheLogIsFiltered) {
 
 TEST_F(HostEndpoints, AFilterThatIsNoneIsRefused) {
     start();
-    for (const char* query : {"?limit=0", "?limit=501", "?limit=x", "?before=-1", "?event=0xZZ",
-                              "?since=yesterday", "?actor=%zz", "?actor=%", "?actor=%ff", "?unknown=1"}) {
-        EXPECT_EQ(get(std::string("/api/log") + query).status, 400) << query;
+    const std::map<std::string, std::string> wrong{
+        {"limit=0", "limit"},         {"limit=1001", "limit"},
+        {"limit=x", "limit"},         {"limit=9999999999", "limit"},
+        {"before=-1", "before"},      {"before=1.5", "before"},
+        {"event=0xZZ", "event"},      {"event=4294967296", "event"},
+        {"since=yesterday", "since"}, {"actor=%zz", "actor"},
+        {"actor=%", "actor"},         {"actor=%ff", "actor"},
+        {"unknown=1", "unknown"},     {"unknown=", "unknown"},
+        {"limit=5&Limit=5", "Limit"}, {"=1", ""},
+    };
+    for (const auto& [query, field] : wrong) {
+        const Answer answer = get("/api/log?" + query);
+        EXPECT_EQ(answer.status, 400) << query;
+        ASSERT_EQ(answer.json()["errors"].size(), 1U) << query;
+        EXPECT_EQ(answer.json()["errors"][0]["field"], field) << query;
+        EXPECT_EQ(answer.json()["detail"].asString(),
+                  field + ": expected " + answer.json()["errors"][0]["expected"].asString() + ".");
     }
+    EXPECT_EQ(get("/api/log?limit=1001").json()["errors"][0]["expected"], "a number from 1 to 1000");
+}
+
+TEST_F(HostEndpoints, APageHoldsAsManyAsTheLogGivesAtOnce) {
+    start();
+    addEntries(1001);
+    const Json::Value page = get("/api/log?limit=1000").json();
+    EXPECT_EQ(page["entries"].size(), 1000U);
+    EXPECT_EQ(page["next"], 2);
+    EXPECT_EQ(ids("?limit=1000&before=2"), std::vector<int>{1});
+    EXPECT_EQ(access.largestLimit, 1000);
 }
 
 TEST_F(HostEndpoints, ALogThatCannotBeReadIsAFailure) {
@@ -175,6 +201,38 @@ TEST_F(HostEndpoints, AReaderThatLeavesIsForgotten) {
     }
     EXPECT_EQ(server->connections(), 0U);
     access.observer.serviceAction("ftpd", "start");
+}
+
+TEST(Events, ReadersThatLeaveBeforeAnyEventAreForgotten) {
+    class Reader : public velt::host::EventReader {
+    public:
+        void deliver(const std::shared_ptr<const std::string>& event) override { last = *event; }
+        std::string last;
+    };
+    velt::host::EventHub hub;
+    const auto stays = std::make_shared<Reader>();
+    hub.add(stays);
+    const std::weak_ptr<Reader> leaves = [&hub] {
+        const auto reader = std::make_shared<Reader>();
+        hub.add(reader);
+        EXPECT_EQ(hub.readers(), 2U);
+        return reader;
+    }();
+    EXPECT_TRUE(leaves.expired());
+    const auto next = std::make_shared<Reader>();
+    hub.add(next);
+    EXPECT_EQ(leaves.use_count(), 0);
+    EXPECT_EQ(hub.readers(), 2U);
+    hub.publish("type", Json::Value(7));
+    EXPECT_EQ(stays->last, "event: type\ndata: 7\n\n");
+    EXPECT_EQ(next->last, stays->last);
+}
+
+TEST_F(HostEndpoints, StreamsOfEventsAreCounted) {
+    start();
+    EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 0\n"), std::string::npos);
+    const Client events = listen();
+    EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 1\n"), std::string::npos);
 }
 
 TEST_F(HostEndpoints, AReaderThatLagsIsLeftBehind) {

@@ -52,7 +52,20 @@ bool openPlatform(const std::filesystem::path&, std::string&) {
 }
 
 bool startEnabledServices(std::string&) {
-    return true;
+    FakeAccess& access = FakeAccess::instance();
+    ++access.starts;
+    if (access.startHelps) {
+        access.down.clear();
+    }
+    return access.down.empty();
+}
+
+std::vector<ServiceDown> servicesDown() {
+    return FakeAccess::instance().down;
+}
+
+std::map<std::string, std::uint64_t> daemonRestarts() {
+    return FakeAccess::instance().restarts;
 }
 
 void observePlatform(PlatformObserver observer) {
@@ -78,8 +91,11 @@ PlatformReport endPlatformRequest() {
     for (std::size_t i = journalStart; i < journal.size(); ++i) {
         const std::string operation = fake::Platform::operationOf(journal[i]);
         report.changed = report.changed || changesSomething(operation);
+        report.stored =
+            report.stored || (changesSomething(operation) && !operation.starts_with("VLIBService"));
         tellObserver(operation);
     }
+    report.storeFailed = access.storeFailed;
     report.sentence = access.sentence;
     report.holder = access.holder;
     report.port = access.port;
@@ -87,7 +103,8 @@ PlatformReport endPlatformRequest() {
 }
 
 std::optional<std::vector<AdminLogEntry>> queryAdminLog(const AdminLogQuery& query, std::string& error) {
-    const FakeAccess& access = FakeAccess::instance();
+    FakeAccess& access = FakeAccess::instance();
+    access.largestLimit = std::max(access.largestLimit, query.limit);
     if (!access.logError.empty()) {
         error = access.logError;
         return std::nullopt;

@@ -138,6 +138,13 @@ TEST_F(HostFraming, AClientMayWaitForContinue) {
     EXPECT_EQ(client.ask(R"({"enable":true})").status, 204);
 }
 
+TEST_F(HostFraming, ABodyThatWouldBeTooLargeIsNotAskedFor) {
+    EXPECT_EQ(refused("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +
+                      "Content-Length: 99999999\r\nExpect: 100-continue\r\n\r\n")
+                  .status,
+              413);
+}
+
 TEST_F(HostFraming, AClientWithoutAccessIsNotToldToContinue) {
     EXPECT_EQ(refused("POST " + target +
                       "set HTTP/1.1\r\nHost: localhost\r\n"

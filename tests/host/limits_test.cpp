@@ -1,10 +1,12 @@
 // Requests that are too large, too slow or too many.
 
+#include "host/descriptors.h"
 #include "tests/host/fake_access.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
 
 #include <sys/resource.h>
+#include <unistd.h>
 
 #include <deque>
 #include <thread>
@@ -152,12 +154,49 @@ TEST_F(HostLimits, ConnectionsBeyondTheLimitAreToldSo) {
     EXPECT_EQ(answer.status, 200);
 }
 
+TEST_F(HostLimits, WhoOnlyConnectsGivesWay) {
+    limits.connections = 5;
+    start();
+    Client trusted = connect();
+    EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200);
+    std::deque<Client> idle;
+    for (int i = 0; i < 20; ++i) {
+        idle.push_back(connect());
+        idle.back().send(i % 2 == 0 ? "" : "GET /heal");
+    }
+    EXPECT_EQ(get("/healthz").status, 200);
+    EXPECT_TRUE(idle.front().ended()) << "the oldest goes first";
+    EXPECT_EQ(idle.back().ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
+    EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200) << "one with access stays";
+    EXPECT_LE(server->connections(), 6U);
+}
+
+TEST_F(HostLimits, ManyWrongTokensKeepNobodyOut) {
+    limits.connections = 100;
+    limits.delayedRefusals = 10;
+    limits.refusalDelay = std::chrono::seconds(3);
+    start();
+    const auto begin = std::chrono::steady_clock::now();
+    std::deque<Client> guesses;
+    for (int i = 0; i < 300; ++i) {
+        guesses.push_back(connect());
+        guesses.back().send(requestText("GET", "/healthz", "Authorization: Bearer guess\r\n"));
+    }
+    EXPECT_EQ(get("/healthz").status, 200);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+    int refused = 0;
+    for (Client& guess : guesses) {
+        const int status = guess.receive().status;
+        EXPECT_TRUE(status == 401 || status == 0) << status;
+        refused += status == 401;
+    }
+    EXPECT_GE(refused, 100) << "who gave way got no answer, the others did";
+    EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3)) << "those that wait do wait";
+}
+
 TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
-    rlimit files{};
-    ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &files), 0);
-    ASSERT_GE(files.rlim_max, 2200U) << "the test needs more descriptors";
-    files.rlim_cur = std::max<rlim_t>(files.rlim_cur, 2200);
-    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &files), 0);
+    // Of this test there are as many descriptors as of the host.
+    ASSERT_EQ(velt::host::makeRoomForConnections(2000), 2000U) << "the test needs more descriptors";
     limits.connections = 1010;
     start();
     std::deque<Client> idle;
@@ -179,6 +218,21 @@ TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
     const auto end = std::chrono::steady_clock::now();
     stop();
     EXPECT_LT(std::chrono::steady_clock::now() - end, std::chrono::seconds(5));
+}
+
+/// Never returns: a hard limit that was lowered does not rise again.
+[[noreturn]] void tryTightLimits() {
+    const rlimit tight = {100, 1000};
+    setrlimit(RLIMIT_NOFILE, &tight);
+    const bool small = velt::host::makeRoomForConnections(500) == 500;
+    const bool large = velt::host::makeRoomForConnections(5000) == 1000 - 256;
+    rlimit now{};
+    getrlimit(RLIMIT_NOFILE, &now);
+    _exit(small && large && now.rlim_cur == 1000 ? 0 : 1);
+}
+
+TEST(Descriptors, AreAsManyAsTheLimitAllows) {
+    EXPECT_EXIT(tryTightLimits(), testing::ExitedWithCode(0), "");
 }
 
 } // namespace

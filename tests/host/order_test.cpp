@@ -71,6 +71,26 @@ TEST_F(HostOrder, ALongWriteDelaysNothingButTheModule) {
     EXPECT_EQ(writer.receive().status, 204);
 }
 
+TEST_F(HostOrder, ModulesThatBlockAllTheirThreadsDelayNothingElse) {
+    settings.workers = 2;
+    start();
+    std::vector<Client> readers;
+    for (int i = 0; i < 4; ++i) {
+        readers.push_back(connect());
+        readers.back().send(
+            requestText("POST", "/api/VELT.Test.Order/v1/get_wait", admin, R"({"milliseconds":600})"));
+    }
+    std::this_thread::sleep_for(milliseconds(100));
+    const auto begin = std::chrono::steady_clock::now();
+    for (const char* target : {"/healthz", "/api", "/api/log", "/api/tokens", "/openapi.json"}) {
+        EXPECT_EQ(get(target).status, 200) << target;
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(400));
+    for (Client& reader : readers) {
+        EXPECT_EQ(reader.receive().status, 204);
+    }
+}
+
 TEST_F(HostOrder, AStopFinishesWhatRuns) {
     start();
     Client client = connect();

@@ -1,5 +1,6 @@
 // Requests that reach the module, over the fake platform.
 
+#include "host/json_text.h"
 #include "tests/host/fake_access.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -94,23 +95,44 @@ TEST_F(HostRows, ARangeWithoutItsPortsIsExplained) {
 
 TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
     platform.takenPorts["ssh"] = {2121, 40000};
-    access.holder = "the SFTP service";
-    access.port = 2121;
-    const Answer control = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":2121})");
-    EXPECT_EQ(control.status, 409);
-    EXPECT_EQ(control.json()["code"], 1903);
-    EXPECT_EQ(control.json()["holder"], "the SFTP service");
-    EXPECT_EQ(control.json()["detail"],
-              "Port conflict. Port 2121 is held by the SFTP service. Nothing was changed.");
-    const Answer range = post(
-        ftp + "3/set",
-        R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true,"custom_port":"39999:40001"})");
-    EXPECT_EQ(range.status, 409);
-    EXPECT_EQ(range.json()["code"], 1904);
     platform.takenPorts["ftp"] = {2222};
-    const Answer other = post(sftp + "set", R"({"enable":true,"portnum":2222})");
-    EXPECT_EQ(other.status, 409);
-    EXPECT_EQ(other.json()["code"], 1951);
+    struct Conflict {
+        std::string target;
+        const char* body;
+        int port;
+        int code;
+        const char* title;
+    };
+    const std::string range =
+        R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true,"custom_port":"39999:40001"})";
+    for (const Conflict& each : std::vector<Conflict>{
+             {ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":2121})", 2121, 1903,
+              "The FTP port is taken"},
+             {ftp + "3/set", range.c_str(), 40000, 1904, "The passive port range is taken"},
+             {sftp + "set", R"({"enable":true,"portnum":2222})", 2222, 1951, "The SFTP port is taken"}}) {
+        access.holder = "nginx (process 812)";
+        access.port = each.port;
+        const Answer answer = post(each.target, each.body);
+        EXPECT_EQ(answer.status, 409);
+        const Json::Value problem = answer.json();
+        EXPECT_EQ(problem["code"], each.code);
+        EXPECT_EQ(problem["title"], each.title);
+        EXPECT_EQ(problem["holder"], "nginx (process 812)");
+        const std::string detail = problem["detail"].asString();
+        EXPECT_TRUE(detail.ends_with(" Port " + std::to_string(each.port) +
+                                     " is held by nginx (process 812). Nothing was changed."))
+            << detail;
+    }
+}
+
+TEST_F(HostRows, APortThatNobodyHoldsIsRefusedInThePlatformsWords) {
+    platform.takenPorts["ssh"] = {0};
+    access.sentence = "The port 0 is not one from 1 to 65535.";
+    const Answer answer = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":0})");
+    EXPECT_EQ(answer.status, 409);
+    EXPECT_FALSE(answer.json().isMember("holder"));
+    EXPECT_EQ(answer.json()["detail"],
+              "Port conflict. The port 0 is not one from 1 to 65535. Nothing was changed.");
 }
 
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {
@@ -129,6 +151,33 @@ TEST_F(HostRows, AFailedOperationTellsThePlatformsSentence) {
     EXPECT_EQ(answer.json()["code"], 1902);
     EXPECT_EQ(answer.json()["detail"],
               "Failed to get SFTP config. The file sftp.conf cannot be read: Permission denied.");
+}
+
+TEST_F(HostRows, AFailureTellsHowFarTheChangeGot) {
+    const auto detail = [this] {
+        const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+        EXPECT_EQ(answer.status, 500);
+        EXPECT_EQ(answer.json()["code"], 1902);
+        return answer.json()["detail"].asString();
+    };
+    platform.fail("VELTSFTPConfigGet");
+    EXPECT_EQ(detail(), "Failed to get SFTP config. Nothing was changed.");
+    platform.reset();
+    platform.fail("VLIBServiceStart");
+    access.sentence = "The SFTP daemon does not start: bad luck.";
+    const std::string started = detail();
+    EXPECT_TRUE(started.ends_with(" The SFTP daemon does not start: bad luck. The new settings are stored."))
+        << started;
+    platform.reset();
+    access.storeFailed = true;
+    platform.fail("VLIBServiceStart");
+    EXPECT_TRUE(detail().ends_with(" Some of the new settings are stored."));
+    platform.reset();
+    platform.fail("VLIBServiceStart");
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":2222})").json()["changed"], true);
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":0})").json()["changed"], false);
+    platform.fail("VELTSFTPConfigGet");
+    EXPECT_FALSE(get(sftp + "get").json().isMember("changed")) << "a read changes nothing anyway";
 }
 
 TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {
@@ -169,6 +218,36 @@ TEST_F(HostRows, UnknownRowsAndPathsAreNotFound) {
           ftp + "99999999999999999999/get", std::string("/apis")}) {
         EXPECT_EQ(post(target).status, 404) << target;
     }
+}
+
+TEST_F(HostRows, PathsAreDecodedSegmentBySegment) {
+    EXPECT_EQ(get("/%68ealthz").status, 200);
+    EXPECT_EQ(get("/api/VELT%2ECore%2eFileServ.FTP.SFTP/v1/ge%74?unused=%zz").status, 200);
+    EXPECT_EQ(post("/%65vents").header("allow"), "GET");
+    for (const char* target : {"/%", "/%4", "/%zz", "/api/%G0", "/%ff", "/healthz%c3"}) {
+        EXPECT_EQ(get(target).status, 400) << target;
+    }
+    for (const char* target :
+         {"//healthz", "/healthz/", "/./healthz", "/x/../healthz", "/healthz%2F", "/api%2Fstatus",
+          "/healthz;x", "/healthz#x", "/HEALTHZ", "/healthz%00", "/healthz%20", "/api/status/", "/*"}) {
+        EXPECT_EQ(get(target).status, 404) << target;
+    }
+}
+
+TEST_F(HostRows, AnAnswerIsUtf8WhateverTheRequestIs) {
+    const Answer path = get("/caf\xE9");
+    EXPECT_EQ(path.status, 400);
+    EXPECT_EQ(velt::host::findInvalidUtf8(path.body), std::string::npos) << path.body;
+    Client client = connect();
+    const Answer host = client.ask("GET /healthz HTTP/1.1\r\nHost: caf\xE9\r\n" + admin + "\r\n");
+    EXPECT_EQ(host.status, 403);
+    EXPECT_NE(host.json()["detail"].asString().find("\"caf\xEF\xBF\xBD\""), std::string::npos) << host.body;
+}
+
+TEST_F(HostRows, ANameThatIsNoUtf8IsShownAsFarAsItCan) {
+    platform.shares["\xC3\x9C\xFF"] = {"", "/", 1};
+    platform.ftpShares = {"\xC3\x9C\xFF"};
+    EXPECT_EQ(get(security + "list_ftp_share").body, "{\"share\":[\"\xC3\x9C\xEF\xBF\xBD\"]}");
 }
 
 TEST_F(HostRows, AWrongMethodIsToldTheRightOnes) {
@@ -227,34 +306,25 @@ TEST_F(HostRows, TheRowsAreListed) {
     EXPECT_EQ(reads, 8);
 }
 
-TEST_F(HostRows, StatusComesFromTheModulesAnswers) {
-    platform.services["ftpd"] = 1;
-    platform.sftp.port = 2022;
-    const Json::Value status = get("/api/status").json();
-    EXPECT_EQ(status["services"][0]["name"], "ftp");
-    EXPECT_EQ(status["services"][0]["enabled"], true);
-    EXPECT_EQ(status["services"][0]["port"], 21);
-    EXPECT_EQ(status["services"][1]["enabled"], false);
-    EXPECT_EQ(status["services"][2]["name"], "sftp");
-    EXPECT_EQ(status["services"][2]["port"], 2022);
-    EXPECT_EQ(get("/healthz").json()["status"], "ok");
-}
-
-TEST_F(HostRows, MetricsCountRequestsByRowAndOutcome) {
-    platform.services["ftpd"] = 1;
-    get(ftp + "3/get");
-    post(sftp + "set", "{}");
-    post(sftp + "set", R"({"enable":true})");
-    const std::string text = get("/metrics").body;
-    for (
-        const char* line :
-        {R"(velt_requests_total{api="VELT.Core.FileServ.FTP",method="get",outcome="success",version="3"} 1)",
-         R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="1901",version="1"} 1)",
-         R"(velt_service_up{service="ftp"} 1)", R"(velt_service_up{service="ftps"} 0)",
-         R"(velt_service_up{service="sftp"} 1)", R"(velt_daemon_starts_total{service="sftp"} 1)",
-         "velt_request_duration_seconds_bucket"}) {
-        EXPECT_NE(text.find(line), std::string::npos) << line << "\n" << text;
-    }
+TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
+    const std::string seen = get(sftp + "get").header("etag");
+    EXPECT_EQ(get(ftp + "3/get").header("etag"), seen) << "reading changes nothing";
+    const std::string ifSeen = admin + "If-Match: " + seen + "\r\n";
+    EXPECT_EQ(ask("POST", sftp + "set", ifSeen, R"({"enable":false,"portnum":22})").status, 204);
+    EXPECT_EQ(get(sftp + "get").header("etag"), seen) << "nothing was different";
+    const Answer first = ask("POST", sftp + "set", ifSeen, R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(first.status, 204);
+    EXPECT_NE(first.header("etag"), seen);
+    const Answer second = ask("POST", sftp + "set", ifSeen, R"({"enable":true,"portnum":2223})");
+    EXPECT_EQ(second.status, 412);
+    EXPECT_EQ(second.json()["detail"],
+              "The settings have changed since they were read. Nothing was changed.");
+    EXPECT_EQ(platform.sftp.port, 2222);
+    EXPECT_EQ(ask("GET", sftp + "get", ifSeen).status, 200) << "a read is no change";
+    const std::string ifNow = admin + "If-Match: \"other\", " + first.header("etag") + "\r\n";
+    EXPECT_EQ(ask("POST", sftp + "set", ifNow, R"({"enable":true,"portnum":2223})").status, 204);
+    EXPECT_EQ(ask("POST", sftp + "set", admin + "If-Match: *\r\n", R"({"enable":true,"portnum":22})").status,
+              204);
 }
 
 } // namespace

@@ -119,39 +119,4 @@ TEST_F(HostTls, FilesThatCannotBeUsedStopTheStart) {
     app.reset();
 }
 
-TEST(Listening, OtherMachinesNeedAnExplicitChoice) {
-    using velt::host::Listener;
-    using velt::host::ListenError;
-    EXPECT_THROW(Listener::tcp("0.0.0.0:0", false), ListenError);
-    EXPECT_THROW(Listener::tcp("[::]:0", false), ListenError);
-    EXPECT_NO_THROW(Listener::tcp("0.0.0.0:0", true));
-    EXPECT_NO_THROW(Listener::tcp("127.1.2.3:0", false));
-    for (const char* address : {"127.0.0.1", "127.0.0.1:", "nonsense:80:80", "127.0.0.1:http", ":"}) {
-        EXPECT_THROW(Listener::tcp(address, false), ListenError) << address;
-    }
-}
-
-TEST(Listening, APortInUseIsAnError) {
-    using velt::host::Listener;
-    const Listener first = Listener::tcp("127.0.0.1:0", false);
-    EXPECT_THROW(Listener::tcp(first.name(), false), velt::host::ListenError);
-}
-
-class UnixSocket : public HostTest {};
-
-TEST_F(UnixSocket, WhatADeadHostLeftIsReplacedALiveOneIsNot) {
-    using velt::host::Listener;
-    {
-        const Listener live = Listener::unixSocket(socketPath, "no-such-group");
-        EXPECT_THROW(Listener::unixSocket(socketPath, "no-such-group"), velt::host::ListenError);
-        EXPECT_TRUE(std::filesystem::exists(socketPath));
-        std::filesystem::rename(socketPath, socketPath + ".stale");
-    }
-    std::filesystem::rename(socketPath + ".stale", socketPath);
-    EXPECT_NO_THROW(Listener::unixSocket(socketPath, "no-such-group"));
-    std::ofstream(socketPath) << "a file";
-    EXPECT_THROW(Listener::unixSocket(socketPath, "no-such-group"), velt::host::ListenError);
-    EXPECT_TRUE(std::filesystem::exists(socketPath)) << "somebody's file";
-}
-
 } // namespace

@@ -1,8 +1,6 @@
 // Chroot users and chroot rules through the module, seen at logins.
 #include "tests/system/support/module_service.h"
 
-#include <algorithm>
-
 namespace velt::test {
 namespace {
 
@@ -25,26 +23,6 @@ protected:
 
     static ModuleAnswer request(int version, const std::string& method, const std::string& parameters) {
         return requestModule("VELT.Core.FileServ.FTP.ChrootUser", version, method, json(parameters));
-    }
-
-    /// What stands in the root of the user's session, sorted; "530" when the login is refused.
-    static std::string rootOf(const std::string& user) {
-        FtpSession session(port);
-        if (const int code = session.logIn(user); code != 230) {
-            return std::to_string(code);
-        }
-        session.command("CDUP");
-        std::istringstream names(namesIn(session));
-        std::vector<std::string> lines;
-        for (std::string line; std::getline(names, line);) {
-            lines.push_back(line + "\n");
-        }
-        std::ranges::sort(lines);
-        std::string sorted;
-        for (const std::string& line : lines) {
-            sorted += line;
-        }
-        return sorted;
     }
 };
 

@@ -26,28 +26,7 @@ TEST_F(ModuleService, endsIdleSessionsAfterTheTimeOut) {
     EXPECT_EQ(longer.command("NOOP").code, 200);
 }
 
-class ModuleRates : public ModuleService {
-protected:
-    static constexpr std::size_t size = 150'000;
-
-    static double secondsToFetch() {
-        writeFile("/mnt/home/alice/data", std::string(size, 'x'), aliceId);
-        FtpSession session = aliceAt();
-        EXPECT_EQ(session.command("TYPE I").code, 200);
-        const auto begin = Clock::now();
-        EXPECT_EQ(session.receive("RETR data").value_or("").size(), size);
-        return secondsSince(begin);
-    }
-    static double secondsToSend() {
-        FtpSession session = aliceAt();
-        EXPECT_EQ(session.command("TYPE I").code, 200);
-        const auto begin = Clock::now();
-        EXPECT_EQ(session.send("STOR sent", std::string(size, 'x')), 226);
-        return secondsSince(begin);
-    }
-};
-
-TEST_F(ModuleRates, limitEachDirectionForItself) {
+TEST_F(ModuleService, limitsEachDirectionForItself) {
     ASSERT_EQ(setFtp(R"({"enable_flow_ctrl": true, "maxdownloadrate": 100, "maxuploadrate": 0})").code, 0);
     EXPECT_GT(secondsToFetch(), 1.0);
     EXPECT_LT(secondsToSend(), 1.0);
@@ -58,7 +37,7 @@ TEST_F(ModuleRates, limitEachDirectionForItself) {
     EXPECT_EQ(getFtp()["maxuploadrate"], 100);
 }
 
-TEST_F(ModuleRates, limitNothingWithoutFlowControl) {
+TEST_F(ModuleService, limitsNothingWithoutFlowControl) {
     ASSERT_EQ(setFtp(R"({"enable_flow_ctrl": false, "maxdownloadrate": 10, "maxuploadrate": 10})").code, 0);
     EXPECT_EQ(getFtp()["enable_flow_ctrl"], false);
     EXPECT_LT(secondsToFetch(), 1.0);
@@ -81,23 +60,6 @@ TEST_F(ModuleService, countsTheConnectionsOfOneAddress) {
         sessions.emplace_back(port);
         EXPECT_EQ(sessions.back().greeting().code, 220);
     }
-}
-
-const std::string latin1 = "gr\xfc\xdf";
-const std::string utf8 = "gr\xc3\xbc\xc3\x9f";
-
-/// Whether the server offers UTF-8, and whether a session starts in it.
-struct NameForms {
-    bool offered = false;
-    bool atStart = false;
-    bool operator==(const NameForms&) const = default;
-};
-
-NameForms nameForms(FtpSession session) {
-    writeFile("/mnt/home/alice/" + utf8, "x", aliceId);
-    const std::string names = namesIn(session);
-    EXPECT_TRUE(contains(names, utf8) || contains(names, latin1)) << names;
-    return {contains(session.command("FEAT").text, "UTF8"), contains(names, utf8)};
 }
 
 TEST_F(ModuleService, hasThreeModesOfFileNames) {

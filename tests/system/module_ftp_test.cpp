@@ -5,17 +5,6 @@
 namespace velt::test {
 namespace {
 
-const std::string certificate = worldRoot / "var/lib/velt/tls/server.crt";
-
-// Whether a TLS client with these further arguments gets a session on the control connection.
-bool handshakes(std::vector<std::string> arguments) {
-    arguments.insert(arguments.begin(), {"openssl", "s_client", "-connect", "127.0.0.1:2121", "-starttls",
-                                         "ftp", "-CAfile", certificate});
-    const auto result = runProcess(arguments, "QUIT\r\n", std::chrono::seconds(20));
-    return contains(result.output, "Verify return code: 0 (ok)") &&
-           !contains(result.output, "Cipher is (NONE)");
-}
-
 class EachVersion : public ModuleService, public testing::WithParamInterface<int> {};
 
 TEST_P(EachVersion, opensAndClosesThePort) {

@@ -18,8 +18,6 @@ protected:
         makeShares();
         ASSERT_EQ(setFtp().code, 0) << lastErrorSentence();
     }
-
-    static int anonymousLogin() { return FtpSession(port).logIn("anonymous", "a@b"); }
 };
 
 TEST_F(ModuleSecurity, letsAnonymousUsersInAndOut) {

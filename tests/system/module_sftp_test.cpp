@@ -2,8 +2,6 @@
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/module_service.h"
 
-#include <unistd.h>
-
 #include <chrono>
 #include <filesystem>
 #include <thread>
@@ -16,51 +14,12 @@ constexpr int sftpPortConflict = 1951;
 
 class ModuleSftp : public ModuleService {
 protected:
-    static constexpr std::size_t size = 600000;
-
     void SetUp() override {
         ModuleService::SetUp();
         if (IsSkipped() || HasFatalFailure()) {
             return;
         }
-        fs::create_directories("/mnt/srv");
-        ASSERT_EQ(runProcess({"ssh-keygen", "-q", "-t", "ed25519", "-N", "", "-f", "/mnt/srv/key"}).exitCode,
-                  0);
-        fs::create_directories("/mnt/home/alice/.ssh");
-        writeFile("/mnt/home/alice/.ssh/authorized_keys", readFileText("/mnt/srv/key.pub"), aliceId);
-        ASSERT_EQ(::chown("/mnt/home/alice/.ssh", aliceId, aliceId), 0);
-        writeFile("/mnt/home/alice/large", std::string(size, 'x'), aliceId);
-    }
-
-    /// An SFTP session of alice that does the commands; its speed in Kbit/s. The limit holds between two
-    /// requests of 32 KiB.
-    static ProcessResult sftp(int atPort, const std::string& commands, const std::string& speed = "1000000") {
-        return runProcess({"sftp",
-                           "-F",
-                           "/dev/null",
-                           "-i",
-                           "/mnt/srv/key",
-                           "-B",
-                           "32768",
-                           "-l",
-                           speed,
-                           "-P",
-                           std::to_string(atPort),
-                           "-o",
-                           "BatchMode=yes",
-                           "-o",
-                           "StrictHostKeyChecking=no",
-                           "-o",
-                           "UserKnownHostsFile=/dev/null",
-                           "-b",
-                           "-",
-                           "alice@127.0.0.1"},
-                          commands, std::chrono::seconds(30));
-    }
-
-    static bool serves(int atPort) {
-        const bool done = sftp(atPort, "get large /mnt/srv/got\n").exitCode == 0;
-        return done && fs::file_size("/mnt/srv/got") == size;
+        furnishSftp();
     }
 
     /// Waits until a part of the file has come.
@@ -80,7 +39,7 @@ TEST_F(ModuleSftp, isSwitchedOnAndOff) {
     EXPECT_EQ(getSftp()["enable"], false);
     const ModuleAnswer answer = setSftp(R"({"enable": true, "portnum": 2222})");
     EXPECT_EQ(answer.code, 0) << answer.sentence;
-    EXPECT_TRUE(serves(2222));
+    EXPECT_TRUE(servesSftp(2222));
     EXPECT_EQ(getSftp()["enable"], true);
     EXPECT_EQ(getSftp()["portnum"], 2222U);
     EXPECT_EQ(setSftp(R"({"enable": false})").code, 0);
@@ -96,12 +55,12 @@ TEST_F(ModuleSftp, movesUnderARunningTransferWhichFinishes) {
     EXPECT_TRUE(hasBegun("/mnt/srv/slow"));
     const ModuleAnswer answer = setSftp(R"({"enable": true, "portnum": 2223})");
     EXPECT_EQ(answer.code, 0) << answer.sentence;
-    EXPECT_LT(fs::file_size("/mnt/srv/slow"), size) << "the move came too late to show anything";
-    EXPECT_TRUE(serves(2223));
+    EXPECT_LT(fs::file_size("/mnt/srv/slow"), largeSize) << "the move came too late to show anything";
+    EXPECT_TRUE(servesSftp(2223));
     EXPECT_FALSE(isListening(2222));
     client.join();
     EXPECT_EQ(transfer.exitCode, 0) << transfer.errors;
-    EXPECT_EQ(readFileText("/mnt/srv/slow"), std::string(size, 'x'));
+    EXPECT_EQ(readFileText("/mnt/srv/slow"), std::string(largeSize, 'x'));
 }
 
 TEST_F(ModuleSftp, endsItsSessionsWhenSwitchedOff) {
@@ -113,7 +72,7 @@ TEST_F(ModuleSftp, endsItsSessionsWhenSwitchedOff) {
     EXPECT_EQ(answer.code, 0) << answer.sentence;
     client.join();
     EXPECT_NE(transfer.exitCode, 0);
-    EXPECT_LT(fs::file_size("/mnt/srv/slow"), size);
+    EXPECT_LT(fs::file_size("/mnt/srv/slow"), largeSize);
 }
 
 TEST_F(ModuleSftp, leavesThePortsOfOthersAlone) {
@@ -126,7 +85,7 @@ TEST_F(ModuleSftp, leavesThePortsOfOthersAlone) {
     EXPECT_EQ(lastPortConflict().port, 2300);
     EXPECT_EQ(setSftp(R"({"enable": true, "portnum": 2121})").code, sftpPortConflict);
     EXPECT_EQ(setSftp(R"({"enable": true, "portnum": 55600})").code, sftpPortConflict);
-    EXPECT_TRUE(serves(2222));
+    EXPECT_TRUE(servesSftp(2222));
 
     ASSERT_EQ(setSftp(R"({"enable": false, "portnum": 2223})").code, 0);
     const UniqueFd holder = listenOn(2223);

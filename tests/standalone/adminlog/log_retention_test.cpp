@@ -110,9 +110,11 @@ TEST_F(LogRetentionTest, ADamagedConfigurationLosesNoEntry) {
     folder_.write("/etc/velt/log.conf", "max_entries=1\n");
     log("1");
     folder_.write("/etc/velt/log.conf", "max_entries=l\n");
+    clearLastError();
     log("2");
     log("3");
     EXPECT_EQ(texts(), (Lines{"3", "2", "1"}));
+    EXPECT_EQ(lastErrorSentence(), "") << "the entries were written";
     EXPECT_FALSE(loadRetention());
     EXPECT_NE(lastErrorSentence().find("log.conf is damaged: line 1 "), std::string::npos)
         << lastErrorSentence();

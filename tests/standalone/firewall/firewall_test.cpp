@@ -9,6 +9,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
+#include "standalone/firewall/ruleset_generation.h"
 #include "tests/standalone/firewall/private_network.h"
 #include "tests/standalone/services/plan_double.h"
 #include "tests/standalone/supervise/daemon_test.h"
@@ -163,8 +164,10 @@ TEST_F(FirewallTest, TheRulesFollowWhatIsEnabled) {
 TEST_F(FirewallTest, RulesThatCannotBeLoadedKeepNoServiceDown) {
     planDouble() = {};
     setMode("mode = open");
+    fail(ErrorNumber::log, "An earlier one.");
     EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_EQ(lastErrorSentence(), "An earlier one.") << "nothing that was asked for has failed";
 }
 
 TEST_F(FirewallTest, SettingsInTheMiddleOfAChangeAreWaitedFor) {
@@ -251,6 +254,71 @@ TEST_F(FirewallTest, AListedEffectChangesNothing) {
     setEffectHook({});
     EXPECT_EQ(listed, "firewall firewall rules");
     EXPECT_EQ(listTable(), "");
+}
+
+/// Counts the changes of the rules, whoever makes them.
+std::uint32_t generation() {
+    return rulesetGeneration().value_or(0);
+}
+
+TEST_F(FirewallTest, RulesThatAreInForceAreNotLoadedAgain) {
+    ASSERT_GT(generation(), 0U);
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::uint32_t loaded = generation();
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(generation(), loaded);
+    storeFtp(2122, VELT_FTP_SERVICE_PLAIN);
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(generation(), loaded + 1);
+    setMode("mode = drop");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(generation(), loaded + 2);
+}
+
+TEST_F(FirewallTest, WhatSomebodyElseRemovedOrChangedComesBack) {
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::string rules = listTable();
+    ASSERT_EQ(runProcess({"nft", "delete", "table", "inet", "velt_fileserv"}).exitCode, 0);
+    ASSERT_EQ(listTable(), "");
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(listTable(), rules);
+    ASSERT_EQ(runProcess({"nft", "flush", "chain", "inet", "velt_fileserv", "input"}).exitCode, 0);
+    ASSERT_NE(listTable(), rules);
+    EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(listTable(), rules);
+}
+
+TEST_F(FirewallTest, RulesOfAnotherNetworkDoNotCount) {
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    const std::uint32_t loaded = generation();
+    const auto loadElsewhere = [loaded] {
+        if (::unshare(CLONE_NEWNET) != 0) {
+            return 2;
+        }
+        // As many changes as were made there.
+        while (generation() < loaded) {
+            runProcess({"nft", "add", "table", "ip", "t" + std::to_string(generation())});
+        }
+        return VELTFwRuleHup() == 0 && listTable().find("2121") != std::string::npos ? 7 : 1;
+    };
+    const pid_t child = ::fork();
+    if (child == 0) {
+        ::_exit(loadElsewhere());
+    }
+    int status = -1;
+    ::waitpid(child, &status, 0);
+    EXPECT_EQ(WEXITSTATUS(status), 7);
+}
+
+TEST_F(FirewallTest, AStartLoadsTheRulesOnce) {
+    planDouble() = {};
+    const std::uint32_t before = generation();
+    for (const char* name : {"ftpd-pure", "ftpd-ssl", "ftpd"}) {
+        ASSERT_EQ(VLIBServicectlStart(name, 0), 0) << lastErrorSentence();
+    }
+    EXPECT_EQ(generation(), before + 1);
+    EXPECT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
 }
 
 TEST_F(FirewallTest, AMarkFromBeforeABootIsNoSignOfRules) {

@@ -1,22 +1,13 @@
 // The service control of the contract, over real processes.
-
-#include "ftp/ftp_library.h"
-#include "platform/service.h"
 #include "platform/sftp.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
-#include "standalone/core/last_error.h"
-#include "standalone/core/state_root.h"
-#include "standalone/services/services.h"
 #include "standalone/standalone.h"
-#include "tests/standalone/services/plan_double.h"
-#include "tests/standalone/supervise/daemon_test.h"
+#include "tests/standalone/services/services_fixture.h"
 
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <csignal>
-#include <cstdio>
 #include <thread>
 
 namespace velt::test {
@@ -24,48 +15,6 @@ namespace {
 
 using std::chrono::milliseconds;
 using std::chrono::seconds;
-
-constexpr int plain = VELT_FTP_SERVICE_PLAIN;
-constexpr int tls = VELT_FTP_SERVICE_TLS;
-
-class ServicesTest : public DaemonTest {
-protected:
-    void SetUp() override {
-        DaemonTest::SetUp();
-        planDouble() = {};
-        ASSERT_EQ(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\nmode = off\n", 0644), 0);
-        storeFtp(plain);
-        storeSftp(false);
-    }
-
-    void TearDown() override {
-        setEffectHook({});
-        EXPECT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
-        EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
-        DaemonTest::TearDown();
-    }
-
-    void storeFtp(int flags, int uploadRate = 0) const {
-        _tag_VELT_FTP_CONF_ record{};
-        ASSERT_EQ(VELTFTPConfGet(&record), 0) << lastErrorSentence();
-        std::snprintf(record.portnum, sizeof record.portnum, "%d", ftpPort_);
-        record.service_flags = flags;
-        record.maxuploadrate = uploadRate;
-        ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
-    }
-
-    void storeSftp(bool enabled) const {
-        ASSERT_EQ(VELTSFTPConfigSet(enabled ? 1 : 0, sftpPort_), 0) << lastErrorSentence();
-    }
-
-    static ProcessId daemonOf(const std::string& service) { return serviceState(service).daemon; }
-    static std::string runKey(const std::string& service) {
-        return readFile(statePath("/etc/velt/run-keys/" + service)).value_or("none");
-    }
-
-    int ftpPort_ = freePort();
-    int sftpPort_ = freePort();
-};
 
 TEST_F(ServicesTest, UnknownNamesFailWithASentence) {
     for (const char* name : {"", "ftp", "ssh", "../ftpd", "ftpd\n", static_cast<const char*>(nullptr)}) {

@@ -116,6 +116,15 @@ TEST_F(FtpContract, TheDaemonIsAskedAboutWhatWouldBeStored) {
     EXPECT_EQ(asked.externalAddress, "203.0.113.7");
 }
 
+TEST_F(FtpContract, ABlankTakesTheExternalAddressAway) {
+    ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
+    ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", " "), 0) << lastErrorSentence();
+    EXPECT_EQ(externalAddress(), "");
+    ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", ""), 0) << lastErrorSentence();
+    EXPECT_EQ(externalAddress(), "");
+    EXPECT_LT(VLIBCINFOSetKeyValue("ftp_ext_ip", " 203.0.113.7"), 0);
+}
+
 TEST_F(FtpContract, WhatTheDaemonRefusesIsNotStored) {
     switchOn();
     const std::string before = root_.read("etc/velt/ftp.conf");

@@ -1,4 +1,5 @@
 #include "ftp/ftp_library.h"
+#include "platform/sftp.h"
 #include "tests/standalone/settings/settings_fixture.h"
 
 #include <sys/wait.h>
@@ -70,6 +71,80 @@ TEST_F(SettingsConcurrency, SettingsOfOneFileDoNotOverwriteEachOther) {
     _tag_VELT_FTP_CONF_ conf{};
     ASSERT_GE(VELTFTPConfGet(&conf), 0);
     EXPECT_EQ(conf.max_conn_per_ip, 200);
+}
+
+// Reads the whole record, changes one field and stores it, again and again, as a request does.
+bool changeOften(std::int32_t _tag_VELT_FTP_CONF_::*field) {
+    for (int i = 1; i <= 200; ++i) {
+        _tag_VELT_FTP_CONF_ conf{};
+        if (VELTFTPConfGet(&conf) < 0 || conf.*field != i - 1)
+            return false;
+        conf.*field = i;
+        if (VELTFTPConfSet(conf) < 0)
+            return false;
+    }
+    return true;
+}
+
+TEST_F(SettingsConcurrency, ProcessesThatChangeDifferentFieldsOfTheRecordLoseNone) {
+    const std::vector fields{&_tag_VELT_FTP_CONF_::max_conn_per_ip, &_tag_VELT_FTP_CONF_::maxuploadrate,
+                             &_tag_VELT_FTP_CONF_::maxdownloadrate};
+    std::vector<std::function<bool()>> works;
+    works.reserve(fields.size());
+    for (const auto field : fields)
+        works.push_back([field] { return changeOften(field); });
+    runAtOnce(works);
+    _tag_VELT_FTP_CONF_ conf{};
+    ASSERT_GE(VELTFTPConfGet(&conf), 0);
+    for (const auto field : fields)
+        EXPECT_EQ(conf.*field, 200);
+}
+
+// Switches one bit of the service flags on and off, and ends with it on.
+bool toggleOften(int bit) {
+    for (int i = 0; i < 201; ++i) {
+        _tag_VELT_FTP_CONF_ conf{};
+        if (VELTFTPConfGet(&conf) < 0 || ((conf.service_flags & bit) != 0) != (i % 2 == 1))
+            return false;
+        conf.service_flags ^= bit;
+        if (VELTFTPConfSet(conf) < 0)
+            return false;
+    }
+    return true;
+}
+
+TEST_F(SettingsConcurrency, ProcessesThatSwitchDifferentServicesLoseNone) {
+    runAtOnce({[] { return toggleOften(VELT_FTP_SERVICE_PLAIN); },
+               [] { return toggleOften(VELT_FTP_SERVICE_TLS); }});
+    _tag_VELT_FTP_CONF_ conf{};
+    ASSERT_GE(VELTFTPConfGet(&conf), 0);
+    EXPECT_EQ(conf.service_flags, VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS);
+}
+
+TEST_F(SettingsConcurrency, ProcessesThatChangeTheSftpPortAndItsSwitchLoseNeither) {
+    const auto movePort = [] {
+        for (int port = 2001; port <= 2200; ++port) {
+            _tag_VELT_SFTP_CONFIG_ conf{};
+            if (VELTSFTPConfigGet(1, &conf) < 0 || VELTSFTPConfigSet(conf.enable, port) < 0 ||
+                VELTSFTPConfigGet(1, &conf) < 0 || conf.port != port)
+                return false;
+        }
+        return true;
+    };
+    const auto toggle = [] {
+        for (int i = 1; i <= 201; ++i) {
+            _tag_VELT_SFTP_CONFIG_ conf{};
+            if (VELTSFTPConfigGet(1, &conf) < 0 || VELTSFTPConfigSet(i % 2, conf.port) < 0 ||
+                VELTSFTPConfigGet(1, &conf) < 0 || conf.enable != i % 2)
+                return false;
+        }
+        return true;
+    };
+    runAtOnce({movePort, toggle});
+    _tag_VELT_SFTP_CONFIG_ conf{};
+    ASSERT_GE(VELTSFTPConfigGet(1, &conf), 0);
+    EXPECT_EQ(conf.port, 2200);
+    EXPECT_EQ(conf.enable, 1);
 }
 
 TEST_F(SettingsConcurrency, AReaderSeesWholeSettingsOnly) {

@@ -108,7 +108,7 @@ DaemonPlan testPlan(int port, const std::string& hash, const std::vector<std::st
 }
 
 void DaemonTest::SetUp() {
-    std::string folder = testing::TempDir() + "velt-daemon-XXXXXX";
+    std::string folder = (std::filesystem::temp_directory_path() / "velt-daemon-XXXXXX").string();
     ASSERT_NE(::mkdtemp(folder.data()), nullptr);
     root_ = folder;
     setStateRoot(root_);

@@ -40,7 +40,8 @@ class StateFile : public testing::Test {
 protected:
     void TearDown() override { std::filesystem::remove(file_); }
 
-    std::filesystem::path file_ = testing::TempDir() + "velt-state-" + std::to_string(::getpid());
+    std::filesystem::path file_ =
+        std::filesystem::temp_directory_path() / ("velt-state-" + std::to_string(::getpid()));
 };
 
 TEST_F(StateFile, ComesBackAsItWasWritten) {

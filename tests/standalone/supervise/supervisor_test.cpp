@@ -153,12 +153,16 @@ TEST_F(SupervisorTest, APortOfAnotherProgramIsFoundBeforeTheDaemonStops) {
 TEST_F(SupervisorTest, AKilledDaemonIsUpAgainWithinTwoSeconds) {
     start();
     const ProcessId daemon = backend_.state().daemon;
+    EXPECT_EQ(backend_.state().restarts, 0U);
     const auto began = Clock::now();
     kill(daemon);
     EXPECT_TRUE(waitUntil([this] { return isServing(backend_.state()); }, seconds(2)));
     RecordProperty("milliseconds", static_cast<int>((Clock::now() - began) / milliseconds(1)));
     EXPECT_NE(backend_.state().daemon, daemon);
     EXPECT_TRUE(accepts(port_));
+    EXPECT_EQ(backend_.state().restarts, 1U);
+    ASSERT_EQ(backend_.start(testPlan(port_, "two")), 0) << lastErrorSentence();
+    EXPECT_EQ(backend_.state().restarts, 1U) << "a start that is asked for is no restart";
 }
 
 TEST_F(SupervisorTest, ADaemonThatKeepsDyingIsStartedLessAndLessOften) {

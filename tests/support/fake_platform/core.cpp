@@ -5,6 +5,7 @@
 #include "tests/support/fake_platform/text.h"
 
 #include <cstdio>
+#include <string_view>
 
 using fake::arguments;
 using fake::Platform;
@@ -23,6 +24,12 @@ std::optional<std::string> findInfo(const std::string& key) {
     return entry == platform.infoKeys.end() ? std::nullopt : std::optional(entry->second);
 }
 
+bool isFolder(std::string_view path) {
+    const std::string_view file = infoFile;
+    return file.starts_with(path) && file.size() > path.size() &&
+           (path.ends_with('/') || file[path.size()] == '/');
+}
+
 void copyText(char* buffer, int size, const std::string& text) {
     if (size > 0) {
         std::snprintf(buffer, static_cast<size_t>(size), "%s", text.c_str());
@@ -36,10 +43,11 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
             Platform::instance().enter("VLIBCFileGetKeyValue", arguments(path, key, size, flags))) {
         return *failure;
     }
-    if (path == nullptr || key == nullptr || value == nullptr || std::string(path) != infoFile) {
+    if (path == nullptr || key == nullptr || value == nullptr || isFolder(path)) {
         return -1;
     }
-    const auto text = findInfo(key);
+    // There is no other file.
+    const auto text = path == std::string_view(infoFile) ? findInfo(key) : std::nullopt;
     // Callers must not rely on the buffer when there is no such key; one that does shows it.
     copyText(value, size, text.value_or("no such key"));
     return text ? 1 : 0;

@@ -113,7 +113,8 @@ struct State {
     /// shows what they gave.
     bool journalErrorGets = false;
 
-    bool enumeratorsReplaceList = false;       ///< a new list stands where the old one stood
+    bool unknownUsersAreRefused = false; ///< as chroot users; tests whose users have no records leave it off
+    bool enumeratorsReplaceList = false; ///< a new list stands where the old one stood
     bool failedEnumeratorsReplaceList = false; ///< the same when the enumerator was made to fail
     bool pushMovesList = false;                ///< every push moves the list; a full list always moves
     bool hashMoves = false;                    ///< every VLIBCSzHashSetValue moves the map

@@ -7,6 +7,7 @@
 #include "tests/support/fake_platform/text.h"
 
 #include <algorithm>
+#include <cstring>
 #include <iterator>
 
 using fake::arguments;
@@ -31,13 +32,24 @@ bool comesFrom(const std::string& name, int source, const char* domain) {
     return (user->second.source & source) != 0 && (domain == nullptr || !own || *own == domain);
 }
 
+bool contains(const std::string& name, const char* substr) {
+    return substr == nullptr || ::strcasestr(name.c_str(), substr) != nullptr;
+}
+
 Names narrowed(const Names& names, int source, const char* substr, const char* domain) {
     Names found;
     std::copy_if(names.begin(), names.end(), std::back_inserter(found), [&](const std::string& name) {
-        return (substr == nullptr || name.find(substr) != std::string::npos) &&
-               comesFrom(name, source, domain);
+        return contains(name, substr) && comesFrom(name, source, domain);
     });
     return found;
+}
+
+bool isKnown(const std::string& name) {
+    const auto& platform = Platform::instance();
+    const auto stands = [&name](const Names& names) {
+        return std::find(names.begin(), names.end(), name) != names.end();
+    };
+    return platform.users.contains(name) || stands(platform.chrootUsers) || stands(platform.nonChrootUsers);
 }
 
 int moveUsers(const char* operation, const VLIBCSzList* list, Names& from, Names& to) {
@@ -48,7 +60,11 @@ int moveUsers(const char* operation, const VLIBCSzList* list, Names& from, Names
     if (platform.handles().use<fake::ListBlock>(list, operation) == nullptr) {
         return -1;
     }
-    for (const std::string& name : fake::textsOf(list, operation)) {
+    const Names names = fake::textsOf(list, operation);
+    if (platform.unknownUsersAreRefused && !std::all_of(names.begin(), names.end(), isKnown)) {
+        return -1;
+    }
+    for (const std::string& name : names) {
         std::erase(from, name);
         if (std::find(to.begin(), to.end(), name) == to.end()) {
             to.push_back(name);

@@ -12,6 +12,7 @@ namespace {
 constexpr int runKeyStarted = 1;
 constexpr int runKeyStopped = 2;
 
+// Whether a service is enabled is the stored settings' business: nothing here changes that.
 void setRunning(const std::string& service, bool running) {
     auto& platform = Platform::instance();
     platform.paused.erase(service);
@@ -22,12 +23,12 @@ void setRunning(const std::string& service, bool running) {
     }
 }
 
-void setEnabled(const std::string& service, bool enabled) {
+void setAlive(const std::string& service, bool alive) {
     auto& platform = Platform::instance();
-    platform.services[service] = enabled ? 1 : 0;
-    setRunning(service, enabled);
+    setRunning(service, alive);
+    platform.runKeys[service] = alive ? runKeyStarted : runKeyStopped;
     if (service == "sftp") {
-        platform.sftpAlive = enabled ? 1 : 0;
+        platform.sftpAlive = alive ? 1 : 0;
     }
 }
 
@@ -64,9 +65,6 @@ int VLIBServicecfgRunKeySet(const char* service, int value) {
         return *failure;
     }
     platform.runKeys[service] = value;
-    if (value == runKeyStarted || value == runKeyStopped) {
-        platform.services[service] = value == runKeyStarted ? 1 : 0;
-    }
     return 0;
 }
 
@@ -74,7 +72,7 @@ int VLIBServiceStart(const char* service, int flags) {
     if (const auto failure = Platform::instance().enter("VLIBServiceStart", arguments(service, flags))) {
         return *failure;
     }
-    setEnabled(service, true);
+    setAlive(service, true);
     return 0;
 }
 
@@ -82,7 +80,7 @@ int VLIBServiceStop(const char* service, int flags) {
     if (const auto failure = Platform::instance().enter("VLIBServiceStop", arguments(service, flags))) {
         return *failure;
     }
-    setEnabled(service, false);
+    setAlive(service, false);
     return 0;
 }
 

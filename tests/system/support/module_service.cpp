@@ -3,18 +3,12 @@
 #include "tests/system/support/leftovers.h"
 
 #include <json/reader.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <sys/stat.h>
 
 #include <algorithm>
-#include <chrono>
 #include <cstdlib>
 #include <memory>
 
 namespace velt::test {
-namespace fs = std::filesystem;
-
 namespace {
 
 constexpr const char* ftpApi = "VELT.Core.FileServ.FTP";
@@ -98,51 +92,6 @@ Json::Value ModuleService::getSftp() {
     return dataOf(requestModule(sftpApi, 1, "get", Json::objectValue));
 }
 
-void ModuleService::makeShares() {
-    std::string text;
-    for (const std::string name : {"public", "music", "upload", "closed"}) {
-        const fs::path folder = fs::path("/mnt/srv") / name;
-        fs::create_directories(folder);
-        EXPECT_EQ(chmod(folder.c_str(), 0777), 0);
-        writeFile(folder / "about", name);
-        const char* grant = name == "public" ? "read" : name == "upload" ? "write" : "none";
-        text += (text.empty() ? "" : ",") + (R"({"name": ")" + name) + R"(", "path": ")" + folder.string() +
-                R"(", "ftp": true, "users": {"ftp": ")" + grant +
-                R"(", "alice": "write", "bob": "write", "carol": "write"}})";
-    }
-    fs::create_directories(worldRoot / "etc/velt");
-    writeFile(worldRoot / "etc/velt/shares.json", R"({"version": 1, "shares": [)" + text + "]}\n");
-}
-
-std::string ModuleService::fetchHome(int fromPort, std::vector<std::string> curlArguments) {
-    curlArguments.insert(curlArguments.begin(),
-                         {"curl", "--silent", "--max-time", "20", "--user", "alice:alice-secret",
-                          "ftp://127.0.0.1:" + std::to_string(fromPort) + "/home-of"});
-    return runProcess(curlArguments, {}, std::chrono::seconds(30)).output;
-}
-
-bool ModuleService::fetchesUnderTls() {
-    return fetchHome(port, {"--ssl-reqd", "--cacert", worldRoot / "var/lib/velt/tls/server.crt"}) == "alice";
-}
-
-FtpSession ModuleService::aliceAt(int atPort) {
-    FtpSession session(atPort);
-    EXPECT_EQ(session.logIn("alice"), 230);
-    return session;
-}
-
-UniqueFd ModuleService::listenOn(int atPort) {
-    UniqueFd listener(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0));
-    const int on = 1;
-    EXPECT_EQ(setsockopt(listener.get(), SOL_SOCKET, SO_REUSEADDR, &on, sizeof on), 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_port = htons(static_cast<in_port_t>(atPort));
-    EXPECT_EQ(bind(listener.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-    EXPECT_EQ(listen(listener.get(), 1), 0);
-    return listener;
-}
-
 std::vector<LogEntry> ModuleService::logEntries() const {
     auto entries = queryLog({});
     EXPECT_TRUE(entries) << lastErrorSentence();
@@ -163,14 +112,6 @@ std::vector<std::string> ModuleService::logSentences() const {
 std::vector<std::string> ModuleService::serviceActions() {
     const std::lock_guard lock(mutex_);
     return actions_;
-}
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
-
-std::string namesIn(FtpSession& session) {
-    return session.receive("NLST").value_or("(refused)");
 }
 
 } // namespace velt::test

@@ -2,11 +2,9 @@
 #ifndef VELT_TESTS_SYSTEM_SUPPORT_MODULE_SERVICE_H
 #define VELT_TESTS_SYSTEM_SUPPORT_MODULE_SERVICE_H
 
-#include "standalone/core/process.h"
-#include "standalone/core/unique_fd.h"
 #include "standalone/standalone.h"
+#include "tests/system/support/clients.h"
 #include "tests/system/support/files.h"
-#include "tests/system/support/ftp_session.h"
 #include "tests/system/support/module_host.h"
 #include "tests/system/support/private_world.h"
 
@@ -21,7 +19,7 @@ namespace velt::test {
 
 class ModuleService : public testing::Test {
 protected:
-    static constexpr int port = 2121;
+    static constexpr int port = ftpTestPort;
     static constexpr int operationFailed = 1902;
     static constexpr int portConflict = 1903;
     static constexpr int rangeConflict = 1904;
@@ -41,18 +39,6 @@ protected:
     static Json::Value getSftp();
     static Json::Value json(const std::string& text);
 
-    /// Writes the file of the shares: "public" (anonymous users read it), "music", "upload" (they write) and
-    /// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name. Alice,
-    /// bob and carol may write in all of them.
-    static void makeShares();
-
-    /// What alice gets when she fetches the file of her home; "" when she is refused.
-    static std::string fetchHome(int fromPort = port, std::vector<std::string> curlArguments = {});
-    static bool fetchesUnderTls();
-    /// A session in which alice is logged in.
-    static FtpSession aliceAt(int atPort = port);
-    static UniqueFd listenOn(int atPort);
-
     /// The log's entries since the start of the test, oldest first.
     std::vector<LogEntry> logEntries() const;
     std::vector<std::string> logSentences() const;
@@ -66,9 +52,6 @@ private:
     std::vector<std::string> actions_;
     Subscription subscription_ = 0;
 };
-
-bool contains(const std::string& text, const std::string& part);
-std::string namesIn(FtpSession& session);
 
 } // namespace velt::test
 

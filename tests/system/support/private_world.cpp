@@ -70,7 +70,7 @@ void makeAccounts() {
     replace("shadow", shadow, 0600);
     replace("group",
             "root:x:0:\nshadow:x:42:\nnogroup:x:65534:\nalice:x:1001:\nbob:x:1002:\ncarol:x:1003:\n"
-            "staff:x:2001:alice,bob\n",
+            "staff:x:2001:alice,bob\nvelt-admin:x:2002:carol\n",
             0644);
     replace("nsswitch.conf", "passwd: files\ngroup: files\nshadow: files\nhosts: files\n", 0644);
 }

@@ -22,7 +22,7 @@ inline const std::filesystem::path worldRoot = "/mnt/root";
 // /mnt/home.
 inline constexpr unsigned aliceId = 1001; // member of "staff"
 inline constexpr unsigned bobId = 1002;   // member of "staff"
-inline constexpr unsigned carolId = 1003;
+inline constexpr unsigned carolId = 1003; // member of "velt-admin"
 inline constexpr unsigned staffId = 2001;
 
 } // namespace velt::test

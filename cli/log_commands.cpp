@@ -1,0 +1,200 @@
+#include "cli/event_stream.h"
+#include "cli/failure.h"
+#include "cli/json_text.h"
+#include "cli/session.h"
+#include "cli/table.h"
+#include "cli/time_text.h"
+
+#include <CLI/CLI.hpp>
+
+#include <ctime>
+#include <memory>
+#include <ostream>
+
+namespace velt::cli {
+
+namespace {
+
+constexpr int defaultPage = 50;
+constexpr int largestPage = 1000;
+
+struct LogOptions {
+    std::string since;
+    std::string event;
+    std::string actor;
+    std::string before;
+    int limit = defaultPage;
+    bool all = false;
+    bool follow = false;
+};
+
+std::string logPath(const LogOptions& options) {
+    std::string path = "/api/log?limit=" + std::to_string(options.limit);
+    const auto add = [&path](const char* name, const std::string& value) {
+        if (!value.empty()) {
+            path += std::string("&") + name + "=" + percentEncode(value);
+        }
+    };
+    if (!options.since.empty()) {
+        const std::optional<std::string> since = parseSince(options.since, std::time(nullptr));
+        if (!since) {
+            throw Failure(ExitCode::usage, "\"" + options.since + "\" is no point in time.",
+                          "Give a time such as 2026-11-21T08:00:00Z, or an age such as 30m, 2h or 7d.");
+        }
+        add("since", *since);
+    }
+    add("event", options.event);
+    add("actor", options.actor);
+    add("before", options.before);
+    return path;
+}
+
+std::string timeOf(const Json::Value& entry) {
+    const Json::Value& time = entry["time"];
+    return time.isIntegral() ? utcText(static_cast<std::time_t>(time.asInt64())) : displayValue(time);
+}
+
+void writeLog(Session& session, const Json::Value& entries, const Json::Value& next) {
+    if (session.json) {
+        Json::Value result;
+        result["entries"] = entries;
+        result["next"] = next;
+        writeJson(session.console.out, result);
+        return;
+    }
+    Table table({"ID", "TIME", "EVENT", "ACTOR", "ADDRESS", "TEXT"});
+    for (const Json::Value& entry : entries) {
+        table.add({textAt(entry, "id"), timeOf(entry), textAt(entry, "event"), textAt(entry, "actor"),
+                   textAt(entry, "address"), textAt(entry, "text")});
+    }
+    table.write(session.console.out);
+    if (!next.isNull()) {
+        session.console.err << "Older entries: veltctl log --before " << printable(displayValue(next))
+                            << " (with the same filters), or --all\n";
+    }
+}
+
+void showLog(Session& session, LogOptions options) {
+    Json::Value entries(Json::arrayValue);
+    Json::Value next;
+    do {
+        const Json::Value page = session.api.get(logPath(options));
+        for (const Json::Value& entry : page["entries"]) {
+            entries.append(entry);
+        }
+        // A server that names the same page again would be asked for ever.
+        next = displayValue(page["next"]) == options.before ? Json::Value() : page["next"];
+        options.before = displayValue(next);
+    } while (options.all && !next.isNull());
+    writeLog(session, entries, next);
+}
+
+// An event's number as the server writes it: hexadecimal or decimal, in any case.
+unsigned long eventNumber(const std::string& text) {
+    return std::strtoul(text.c_str(), nullptr, 0);
+}
+
+// The entries as they come, one on a line.
+class FollowedLog {
+public:
+    FollowedLog(Session& session, const LogOptions& options) : session_(session), options_(options) {}
+
+    // The newest entries so far, in the order in which they came.
+    void begin() {
+        // The connection that follows is in use.
+        ApiClient api(session_.api.endpoint());
+        const Json::Value page = api.get(logPath(options_));
+        for (Json::ArrayIndex i = page["entries"].size(); i > 0; --i) {
+            write(page["entries"][i - 1]);
+        }
+    }
+
+    void take(const std::string& event, const std::string& data) {
+        std::string problem;
+        const Json::Value entry = parseJson(data, problem).value_or(Json::Value());
+        if (event == "log" && entry.isObject() && matches(entry)) {
+            write(entry);
+        }
+    }
+
+private:
+    bool matches(const Json::Value& entry) const {
+        return (options_.actor.empty() || textAt(entry, "actor") == options_.actor) &&
+               (options_.event.empty() || eventNumber(textAt(entry, "event")) == eventNumber(options_.event));
+    }
+
+    void write(const Json::Value& entry) {
+        // An entry may be on the page and be announced as well.
+        if (entry["id"].asInt64() <= last_) {
+            return;
+        }
+        last_ = entry["id"].asInt64();
+        std::ostream& out = session_.console.out;
+        if (session_.json) {
+            out << compactJson(entry) << '\n';
+        } else {
+            const char* gap = "  ";
+            out << printable(timeOf(entry)) << gap << printable(textAt(entry, "event")) << gap
+                << printable(textAt(entry, "actor")) << gap << printable(textAt(entry, "address")) << gap
+                << printable(textAt(entry, "text")) << '\n';
+        }
+        out.flush();
+    }
+
+    Session& session_;
+    const LogOptions& options_;
+    std::int64_t last_ = 0;
+};
+
+void followLog(Session& session, const LogOptions& options) {
+    FollowedLog log(session, options);
+    EventStream stream([&log](const std::string& event, const std::string& data) { log.take(event, data); });
+    session.console.watchInterruptions();
+    bool begun = false;
+    session.api.follow(
+        "/events",
+        [&](std::string_view piece) {
+            // Only once the stream is there: what is written in between is on the page then.
+            if (!begun) {
+                begun = true;
+                log.begin();
+            }
+            stream.feed(piece);
+            return session.console.out.good();
+        },
+        session.console.interrupted);
+    if (session.console.out.good() && !session.console.interrupted()) {
+        throw Failure(ExitCode::access, "The server ended the stream of events.",
+                      "Check with 'veltctl status' that it runs, then follow the log again.");
+    }
+}
+
+} // namespace
+
+void addLogCommand(CLI::App& app, Command& chosen) {
+    auto options = std::make_shared<LogOptions>();
+    CLI::App* log = app.add_subcommand("log", "Show the administrator log, the newest entries first");
+    log->add_option("--since", options->since, "Entries since a time, or not older than 30m, 2h, 7d")
+        ->type_name("TIME");
+    log->add_option("--event", options->event, "Entries of one event, such as 0x11B00012")
+        ->type_name("EVENT");
+    log->add_option("--actor", options->actor, "Entries of one actor")->type_name("NAME");
+    CLI::Option* before =
+        log->add_option("--before", options->before, "Entries older than the one with this id")
+            ->type_name("ID");
+    log->add_option("--limit", options->limit, "Entries per page, 1 to 1000 (default 50)")
+        ->check(CLI::Range(1, largestPage))
+        ->type_name("N");
+    CLI::Option* all = log->add_flag("--all", options->all, "All pages, not only one");
+    log->add_flag("-f,--follow", options->follow,
+                  "Show the newest entries last and go on with those to come, until interrupted")
+        ->excludes(before)
+        ->excludes(all);
+    log->callback([&chosen, options] {
+        chosen = [options](Session& session) {
+            options->follow ? followLog(session, *options) : showLog(session, *options);
+        };
+    });
+}
+
+} // namespace velt::cli

@@ -1,0 +1,65 @@
+#include "standalone/firewall/loaded_rules.h"
+
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/firewall/ruleset_generation.h"
+#include "standalone/supervise/process_identity.h"
+
+#include <sys/stat.h>
+#include <syslog.h>
+
+#include <filesystem>
+#include <string>
+#include <system_error>
+
+namespace velt {
+namespace {
+
+std::filesystem::path noteFile() {
+    return statePath("/run/velt/firewall.loaded");
+}
+
+/// The network whose rules are meant: each has generations of its own.
+std::string networkId() {
+    struct stat network {};
+    return ::stat("/proc/self/ns/net", &network) == 0 ? std::to_string(network.st_ino) : "";
+}
+
+std::string note(std::uint32_t generation, std::string_view script) {
+    return bootId() + "\n" + networkId() + " " + std::to_string(generation) + "\n" + std::string(script);
+}
+
+} // namespace
+
+bool rulesWereLoaded() {
+    const auto text = readFile(noteFile());
+    return text && text->substr(0, text->find('\n')) == bootId();
+}
+
+bool rulesAreInForce(std::string_view script) {
+    const auto generation = rulesetGeneration();
+    return generation && readFile(noteFile()) == note(*generation, script);
+}
+
+int noteLoading() {
+    return replaceFile(noteFile(), bootId(), 0644);
+}
+
+void noteLoaded(std::string_view script, std::optional<std::uint32_t> before) {
+    const auto now = rulesetGeneration();
+    if (!before || !now || *now != *before + 1) {
+        return; // the note of the loading stands
+    }
+    const LastErrorKept kept;
+    if (replaceFile(noteFile(), note(*now, script), 0644) < 0) {
+        ::syslog(LOG_WARNING, "%s", lastErrorSentence().c_str());
+    }
+}
+
+void noteRemoved() {
+    std::error_code ignored;
+    std::filesystem::remove(noteFile(), ignored);
+}
+
+} // namespace velt

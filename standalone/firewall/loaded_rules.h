@@ -1,0 +1,32 @@
+// What we know of the rules that we loaded last: a note below the state root. To be called under the
+// StateLock.
+#ifndef VELT_STANDALONE_FIREWALL_LOADED_RULES_H
+#define VELT_STANDALONE_FIREWALL_LOADED_RULES_H
+
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+namespace velt {
+
+/// Whether rules of ours were loaded, or were about to be, since the machine started. (Below a state root
+/// other than "/" the note outlives a boot, the rules do not.)
+bool rulesWereLoaded();
+
+/// Whether the rules that this script loads are in force: it was the last that we loaded here, and nobody has
+/// changed any rule of this network since.
+bool rulesAreInForce(std::string_view script);
+
+/// Notes that rules are about to be loaded. Negative on failure, with the last error set.
+int noteLoading();
+
+/// Notes that the script was loaded. `before` is the ruleset's generation of before that: when somebody else
+/// made a change in between, the rules count as loaded, but not as in force.
+void noteLoaded(std::string_view script, std::optional<std::uint32_t> before);
+
+/// Notes that no rules of ours are loaded.
+void noteRemoved();
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,113 @@
+// Under which names the daemons' words are found in the system's log.
+#include "standalone/core/last_error.h"
+#include "standalone/core/unique_fd.h"
+#include "standalone/services/supervise_backend.h"
+#include "tests/standalone/supervise/daemon_test.h"
+
+#include <fcntl.h>
+#include <sched.h>
+#include <sys/mount.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/sysmacros.h>
+#include <sys/un.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstring>
+#include <fstream>
+
+namespace velt::test {
+namespace {
+
+/// A "/dev" of this process's own, in which this process is the system's log.
+class OwnLog {
+public:
+    explicit OwnLog(const std::filesystem::path& folder) {
+        std::filesystem::create_directories(folder);
+        const bool apart = ::unshare(CLONE_NEWNS) == 0 &&
+                           ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
+                           ::mount("velt-test", folder.c_str(), "tmpfs", 0, "mode=0755") == 0 &&
+                           ::mknod((folder / "null").c_str(), S_IFCHR | 0666, makedev(1, 3)) == 0 &&
+                           ::mount(folder.c_str(), "/dev", nullptr, MS_BIND, nullptr) == 0;
+        socket_ = UniqueFd(apart ? ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0) : -1);
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        std::strcpy(address.sun_path, "/dev/log");
+        const timeval patience{2, 0};
+        isThere_ = socket_ &&
+                   ::bind(socket_.get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0 &&
+                   ::setsockopt(socket_.get(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience) == 0;
+    }
+
+    bool isThere() const { return isThere_; }
+
+    /// The next line that holds the text; "" when none comes.
+    std::string lineWith(const std::string& text) const {
+        std::array<char, 1024> line{};
+        for (ssize_t size = 0; (size = ::recv(socket_.get(), line.data(), line.size(), 0)) > 0;) {
+            const std::string received(line.data(), static_cast<std::size_t>(size));
+            if (received.find(text) != std::string::npos) {
+                return received;
+            }
+        }
+        return "";
+    }
+
+private:
+    UniqueFd socket_;
+    bool isThere_ = false;
+};
+
+class SyslogTest : public DaemonTest {
+protected:
+    /// The line with `sign` that the supervisor of this service writes when its daemon says the words; found
+    /// in a child, whose "/dev" goes with it.
+    std::string lineOf(const std::string& service, const std::string& words, const std::string& sign) const {
+        const std::filesystem::path told = root_ / "line";
+        const pid_t child = ::fork();
+        if (child == 0) {
+            const OwnLog log(root_ / "dev");
+            if (!log.isThere()) {
+                ::_exit(77);
+            }
+            SuperviseBackend backend(service);
+            backend.start(testPlan(freePort(), "one", {"--refuse", words}));
+            std::ofstream(told) << log.lineWith(sign);
+            ::_exit(0);
+        }
+        int status = -1;
+        ::waitpid(child, &status, 0);
+        if (WEXITSTATUS(status) == 77) {
+            return "skip";
+        }
+        std::string line;
+        std::getline(std::ifstream(told), line);
+        return line;
+    }
+};
+
+TEST_F(SyslogTest, ADaemonsWordsAreUnderItsName) {
+    for (const auto& [service, name] :
+         {std::pair("ftpd", " velt-ftpd["), std::pair("sftp", " velt-sftpd[")}) {
+        const std::string line = lineOf(service, "no such certificate", "certificate");
+        if (line == "skip") {
+            GTEST_SKIP() << "no mount name space can be made here";
+        }
+        EXPECT_TRUE(line.starts_with("<29>")) << "a notice of a daemon: " << line;
+        EXPECT_NE(line.find(name), std::string::npos) << line;
+        EXPECT_TRUE(line.ends_with("]: no such certificate")) << line;
+    }
+}
+
+TEST_F(SyslogTest, NoWordForgesALineOrAFormat) {
+    const std::string line = lineOf("ftpd", "50%n \x1b[2J\rvelt-ftpd[1]: forged", "50%");
+    if (line == "skip") {
+        GTEST_SKIP() << "no mount name space can be made here";
+    }
+    EXPECT_TRUE(line.ends_with("]: 50%n [2Jvelt-ftpd[1]: forged")) << line;
+}
+
+} // namespace
+} // namespace velt::test
