@@ -149,11 +149,9 @@ void removeStale(const std::filesystem::path& path, const sockaddr_un& address) 
 
 void giveToGroup(const std::filesystem::path& path, const std::string& name) {
     const auto group = groupNamed(name);
-    if (!group || lchown(path.c_str(), static_cast<uid_t>(-1), *group) == 0) {
-        return;
-    }
-    // Without root's rights a file cannot be given to a group of others: the socket is the user's own then.
-    if (errno != EPERM || geteuid() == 0) {
+    const bool given = !group || lchown(path.c_str(), static_cast<uid_t>(-1), *group) == 0;
+    // A user who is not in the group cannot give it anything, and runs a host of his own, for himself.
+    if (!given && (errno != EPERM || geteuid() == 0)) {
         throw ListenError("The group " + name + " cannot be given " + path.string() + ": " + systemError() +
                           ".");
     }

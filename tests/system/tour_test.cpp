@@ -173,7 +173,7 @@ TEST_F(QuickStart, saysWhenFtpCannotWork) {
                                                  "-sys_admin"};
     EXPECT_TRUE(contains(run(tree_, startBuilt, withoutMounts), "FTP will not start here: as root "));
     const std::string use =
-        run(tree_, ". var/env; veltctl ftp set enable_ftp=on; veltctl sftp set enable=on", withoutMounts);
+        run(tree_, ". var/env; veltctl sftp set enable=on; veltctl ftp set enable_ftp=on", withoutMounts);
     EXPECT_TRUE(contains(use, "mounts of their own are not possible")) << use;
     EXPECT_TRUE(contains(use, "enable: off -> on")) << use;
 }
