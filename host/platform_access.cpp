@@ -80,6 +80,18 @@ bool startEnabledServices(std::string& error) {
     return true;
 }
 
+bool watchServices(std::string& error) {
+    if (velt::watchServices() < 0) {
+        error = lastErrorSentence();
+        return false;
+    }
+    return true;
+}
+
+void unwatchServices() {
+    velt::unwatchServices();
+}
+
 void observePlatform(PlatformObserver observer) {
     const auto shared = std::make_shared<const PlatformObserver>(std::move(observer));
     {

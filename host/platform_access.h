@@ -64,6 +64,11 @@ bool openPlatform(const std::filesystem::path& stateRoot, std::string& error);
 /// the others run.
 bool startEnabledServices(std::string& error);
 
+/// From now on, on a thread of its own, starts a service again that has lost what looks after it, until
+/// unwatchServices, which waits for a start that goes on. False, with the reason in `error`, on failure.
+bool watchServices(std::string& error);
+void unwatchServices();
+
 /// A service that the settings enable and that does not follow them.
 struct ServiceDown {
     std::string service;               ///< "ftp" (with FTPS) or "sftp"
