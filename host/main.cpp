@@ -73,20 +73,6 @@ HttpLimits possibleLimits(const Config& config, HostLog& log) {
     return limits;
 }
 
-/// While it lives, a service that loses its supervisor is started again.
-class ServiceWatch {
-public:
-    explicit ServiceWatch(HostLog& log) {
-        std::string error;
-        if (!velt::host::watchServices(error)) {
-            log.write("nobody looks whether the services stay up: " + error);
-        }
-    }
-    ~ServiceWatch() { velt::host::unwatchServices(); }
-    ServiceWatch(const ServiceWatch&) = delete;
-    ServiceWatch& operator=(const ServiceWatch&) = delete;
-};
-
 void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     std::string error;
     if (!velt::host::openPlatform(config.stateRoot, error)) {
@@ -106,7 +92,9 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     if (!velt::host::startEnabledServices(error)) {
         log.write("not every enabled service started: " + error);
     }
-    const ServiceWatch watch(log);
+    if (!velt::host::watchServices(error)) {
+        log.write("nobody watches the services: " + error);
+    }
     server.start(config.ioThreads);
     if (config.printReady) {
         std::printf("%s\n", velt::host::toJson(ready).c_str());
@@ -117,6 +105,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     log.write("stopping");
     server.stop(config.stopTime);
     app.stop();
+    velt::host::unwatchServices();
     log.write("stopped");
 }
 

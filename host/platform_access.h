@@ -64,8 +64,8 @@ bool openPlatform(const std::filesystem::path& stateRoot, std::string& error);
 /// the others run.
 bool startEnabledServices(std::string& error);
 
-/// From now on, on a thread of its own, starts a service again that has lost what looks after it, until
-/// unwatchServices, which waits for a start that goes on. False, with the reason in `error`, on failure.
+/// Brings daemons back whose supervisors were killed, from now on until unwatchServices. False, with the
+/// reason in `error`, when that is impossible.
 bool watchServices(std::string& error);
 void unwatchServices();
 

@@ -15,7 +15,7 @@ namespace velt {
 std::string renderEvent(const SystemEvent& event);
 
 /// The newest file is put among the older ones before it would grow beyond this.
-inline constexpr std::size_t largestEventFile = 4 * 1024 * 1024;
+inline constexpr std::size_t largestEventFile = 4UL * 1024 * 1024;
 inline constexpr int keptEventFiles = 4;
 
 /// Appends the event's line. Lines of several processes never mix, the file may be renamed away at any time,

@@ -23,10 +23,13 @@ TEST_F(HostFtpLimits, timeOutAndConnections) {
          1,
          100,
          [](const Json::Value& seconds) {
-             FtpSession session = aliceAt();
+             FtpSession session(port);
+             const int code = session.logIn("alice");
              if (seconds == 1) {
-                 EXPECT_EQ(session.read().code, 421);
+                 // On a busy machine the time may be out before the login is done.
+                 EXPECT_EQ(code == 230 ? session.read().code : code, 421);
              } else {
+                 EXPECT_EQ(code, 230);
                  std::this_thread::sleep_for(std::chrono::milliseconds(1300));
                  EXPECT_EQ(session.command("NOOP").code, 200);
              }

@@ -48,7 +48,8 @@ TEST_F(ServiceWatchTest, AKilledSupervisorIsReplacedWithinTwoSeconds) {
     }
     EXPECT_TRUE(accepts(ftpPort_));
     EXPECT_TRUE(accepts(sftpPort_));
-    EXPECT_EQ(leftProcesses().size(), 4U) << "two supervisors and their daemons";
+    EXPECT_TRUE(waitUntil([] { return leftProcesses().size() == 4; }, seconds(2)))
+        << "two supervisors and their daemons remain, once the sessions of these connections have ended";
 }
 
 TEST_F(ServiceWatchTest, ADaemonThatDiesWithItsSupervisorIsUpAgainWithinTwoSeconds) {
