@@ -166,6 +166,22 @@ TEST_F(HostRecord, aKilledHostLeavesWholeSettingsAndDaemonsToTheNext) {
     }
 }
 
+TEST_F(HostRecord, aKilledSupervisorIsReplacedAndItsDaemonToo) {
+    done({"ftp", "set", "enable_ftp=on"});
+    const std::string supervisor = pidsOf("velt-supervise");
+    const std::string daemon = pidsOf("proftpd");
+    ASSERT_EQ(kill(std::stoi(supervisor), SIGKILL), 0);
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(5);
+    const auto servesAnew = [&] { return !contains(pidsOf("proftpd"), daemon) && fetchHome() == "alice"; };
+    bool serves = servesAnew();
+    while (!serves && std::chrono::steady_clock::now() < deadline) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        serves = servesAnew();
+    }
+    EXPECT_TRUE(serves) << "nobody looks after the daemon any more";
+    EXPECT_NE(pidsOf("velt-supervise"), "");
+}
+
 TEST_F(HostRecord, aServiceThatIsDownStaysSwitchedOnWhenAnotherSettingChanges) {
     done({"ftp", "set", "enable_ftp=on"});
     done({"sftp", "set", "enable=on"});

@@ -78,6 +78,14 @@ TEST_F(FtpService, bothServicesShareOnePort) {
     EXPECT_EQ(curl(secure).output, "bob");
 }
 
+TEST_F(FtpService, clientsThatResumeNoTlsSessionGetTheirData) {
+    offerTls(false);
+    start();
+    const auto file = curl({"--no-sessionid", "--ssl-reqd", "--cacert", certificate, "--user",
+                            "alice:alice-secret", "ftp://127.0.0.1:2121/home-of"});
+    EXPECT_EQ(file.output, "alice") << file.errors;
+}
+
 TEST_F(FtpService, lftpTransfersUnderTls) {
     offerTls(false);
     start();
