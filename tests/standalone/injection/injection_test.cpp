@@ -53,8 +53,7 @@ const std::string attempts[] = {
     " leading",
     "trailing ",
     "a\tb",
-    "a\x01"
-    "b",
+    "\x01 b",
     "\x7f",
     "\x1b[2J",
     "\xff\xfe",
