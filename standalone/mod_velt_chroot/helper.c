@@ -140,8 +140,8 @@ static int await(pid_t child, int errors, int limit, char* words, size_t size) {
 }
 
 int velt_helper_run(char* const arguments[], int limit, char* words, size_t size) {
-    int ends[2];
-    pid_t child;
+    int ends[2] = {-1, -1};
+    pid_t child = -1;
 
     words[0] = '\0';
     if (pipe2(ends, O_CLOEXEC) < 0) {

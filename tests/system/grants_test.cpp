@@ -3,8 +3,6 @@
 
 #include <thread>
 
-#include <thread>
-
 namespace velt::test {
 namespace {
 namespace fs = std::filesystem;

@@ -11,8 +11,6 @@ constexpr const char* homeOnly = "home-of\r\n";
 
 class HostOther : public SettingTable {
 protected:
-    static constexpr const char* shares = "closed\r\nmusic\r\npublic\r\nupload\r\n";
-
     void SetUp() override {
         SettingTable::SetUp();
         if (!IsSkipped() && !HasFatalFailure()) {

@@ -49,9 +49,11 @@ TEST_F(FakePlatform, StoresWhatASetterGets) {
     EXPECT_EQ(VELTFTPTimeOutGet(), 60);
     EXPECT_EQ(VELTFTPUmaskEnabledSet(true), 0);
     EXPECT_EQ(VELTFTPUmaskEnabledGet(), 1);
-    EXPECT_EQ(VLIBServicecfgRunKeySet("ftpd", 1), 0);
-    EXPECT_EQ(VLIBServiceIsEnabled("ftpd"), 1);
+    platform.services["ftpd"] = 1;
     EXPECT_EQ(VLIBServicecfgRunKeySet("ftpd", 2), 0);
+    EXPECT_EQ(VLIBServiceIsEnabled("ftpd"), 1);
+    platform.services["ftpd"] = 0;
+    EXPECT_EQ(VLIBServicecfgRunKeySet("ftpd", 1), 0);
     EXPECT_EQ(VLIBServiceIsEnabled("ftpd"), 0);
     EXPECT_EQ(VELTSFTPConfigSet(1, 2222), 0);
     _tag_VELT_SFTP_CONFIG_ sftp{};
