@@ -113,6 +113,15 @@ void mountKernel() {
     mountNew("tmpfs", root / "tmp", MS_NOSUID | MS_NODEV, "mode=1777");
 }
 
+/// It may lie on a file system of its own, which the layer does not show, or below one of those that are new
+/// here. As a layer, too: what tidies up at a boot must not reach the real one.
+void showBuiltFolder() {
+    const fs::path built = root / fs::path(VELT_BUILT_FOLDER).relative_path();
+    fs::create_directories(built);
+    mountNew("overlay", built, 0,
+             "lowerdir=" VELT_BUILT_FOLDER ",upperdir=/mnt/built/written,workdir=/mnt/built/work");
+}
+
 void giveUpTheMachine() {
     for (const int capability :
          {CAP_SYS_BOOT, CAP_SYS_TIME, CAP_SYS_MODULE, CAP_SYS_RAWIO, CAP_SYS_PACCT, CAP_SYSLOG, CAP_MKNOD,
@@ -128,14 +137,10 @@ void makeSystemdRoot() {
         check(::unshare(CLONE_NEWNS) == 0, "no name space for mounts can be made");
         check(::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0, "/");
         mountNew("tmpfs", disk, MS_NOSUID, "mode=0755");
-        for (const char* folder : {"root", "written", "work"}) {
+        for (const char* folder : {"root", "written", "work", "built/written", "built/work"}) {
             fs::create_directories(disk / folder);
         }
         mountNew("overlay", root, 0, "lowerdir=/,upperdir=/mnt/written,workdir=/mnt/work");
-        // It may lie on a file system of its own, which the layer does not show.
-        const fs::path built = root / fs::path(VELT_BUILT_FOLDER).relative_path();
-        fs::create_directories(built);
-        bind(VELT_BUILT_FOLDER, built);
         thinOut();
         makeAlice();
     } catch (const std::runtime_error& error) {
@@ -155,6 +160,7 @@ void enterSystemdRoot(const std::string& group) {
     check(::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0, "/");
     mountKernel();
     makeDevices();
+    showBuiltFolder();
     fs::create_directories(root / "former");
     check(::chdir(root.c_str()) == 0 && ::syscall(SYS_pivot_root, ".", "former") == 0 && ::chdir("/") == 0 &&
               ::umount2("/former", MNT_DETACH) == 0,
