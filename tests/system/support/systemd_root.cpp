@@ -113,13 +113,15 @@ void mountKernel() {
     mountNew("tmpfs", root / "tmp", MS_NOSUID | MS_NODEV, "mode=1777");
 }
 
-/// It may lie on a file system of its own, which the layer does not show, or below one of those that are new
-/// here. As a layer, too: what tidies up at a boot must not reach the real one.
-void showBuiltFolder() {
-    const fs::path built = root / fs::path(VELT_BUILT_FOLDER).relative_path();
-    fs::create_directories(built);
-    mountNew("overlay", built, 0,
-             "lowerdir=" VELT_BUILT_FOLDER ",upperdir=/mnt/built/written,workdir=/mnt/built/work");
+/// A folder of the real machine that may lie on a file system of its own, which the layer does not show, or
+/// below one of those that are new here. As a layer, too: what tidies up at a boot must not reach the real
+/// one.
+void show(const std::string& folder, const std::string& layer) {
+    const fs::path place = root / fs::path(folder).relative_path();
+    fs::create_directories(place);
+    const std::string options =
+        "lowerdir=" + folder + ",upperdir=/mnt/" + layer + "/written,workdir=/mnt/" + layer + "/work";
+    mountNew("overlay", place, 0, options.c_str());
 }
 
 void giveUpTheMachine() {
@@ -137,7 +139,8 @@ void makeSystemdRoot() {
         check(::unshare(CLONE_NEWNS) == 0, "no name space for mounts can be made");
         check(::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0, "/");
         mountNew("tmpfs", disk, MS_NOSUID, "mode=0755");
-        for (const char* folder : {"root", "written", "work", "built/written", "built/work"}) {
+        for (const char* folder :
+             {"root", "written", "work", "source/written", "source/work", "built/written", "built/work"}) {
             fs::create_directories(disk / folder);
         }
         mountNew("overlay", root, 0, "lowerdir=/,upperdir=/mnt/written,workdir=/mnt/work");
@@ -160,7 +163,8 @@ void enterSystemdRoot(const std::string& group) {
     check(::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0, "/");
     mountKernel();
     makeDevices();
-    showBuiltFolder();
+    show(VELT_SOURCE_FOLDER, "source"); // an installation takes some files from it
+    show(VELT_BUILT_FOLDER, "built");
     fs::create_directories(root / "former");
     check(::chdir(root.c_str()) == 0 && ::syscall(SYS_pivot_root, ".", "former") == 0 && ::chdir("/") == 0 &&
               ::umount2("/former", MNT_DETACH) == 0,
