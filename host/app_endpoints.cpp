@@ -14,15 +14,6 @@ namespace {
 
 constexpr std::size_t maxTokenName = 64;
 
-Json::Value toObject(const Token& token) {
-    Json::Value object(Json::objectValue);
-    object["id"] = token.id;
-    object["name"] = token.name;
-    object["role"] = roleName(token.role);
-    object["created"] = token.created;
-    return object;
-}
-
 /// A name that can stand in logs: not empty, no control characters.
 bool isTokenName(const std::string& name) {
     for (const char c : name) {

@@ -32,12 +32,8 @@ std::string hashOf(const std::string& token) {
     return hexadecimal(digest.data(), digest.size());
 }
 
-Json::Value toObject(const Token& token) {
-    Json::Value object(Json::objectValue);
-    object["id"] = token.id;
-    object["name"] = token.name;
-    object["role"] = roleName(token.role);
-    object["created"] = token.created;
+Json::Value toStored(const Token& token) {
+    Json::Value object = toObject(token);
     object["sha256"] = token.hash;
     return object;
 }
@@ -88,6 +84,15 @@ bool syncFolder(const std::filesystem::path& folder) {
 
 } // namespace
 
+Json::Value toObject(const Token& token) {
+    Json::Value object(Json::objectValue);
+    object["id"] = token.id;
+    object["name"] = token.name;
+    object["role"] = roleName(token.role);
+    object["created"] = token.created;
+    return object;
+}
+
 const char* roleName(Role role) {
     return role == Role::admin ? "admin" : "viewer";
 }
@@ -131,7 +136,7 @@ void TokenStore::store(const std::vector<Token>& tokens) const {
     Json::Value root(Json::objectValue);
     root["tokens"] = Json::Value(Json::arrayValue);
     for (const Token& token : tokens) {
-        root["tokens"].append(toObject(token));
+        root["tokens"].append(toStored(token));
     }
     std::error_code folderError;
     const std::filesystem::path folder = file_.parent_path();

@@ -4,6 +4,8 @@
 
 #include "host/http/message.h"
 
+#include <json/value.h>
+
 #include <filesystem>
 #include <mutex>
 #include <optional>
@@ -26,6 +28,9 @@ struct Token {
     std::string created; ///< "2026-11-21T06:30:00.000Z"
     std::string hash;    ///< SHA-256 of the token, 64 hexadecimal digits
 };
+
+/// What everybody may know of a token: all but its hash.
+Json::Value toObject(const Token& token);
 
 /// Thread-safe.
 class TokenStore {
