@@ -1,11 +1,11 @@
 #include "standalone/core/process.h"
 
+#include "standalone/core/spawn_setup.h"
 #include "standalone/core/unique_fd.h"
 
 #include <fcntl.h>
 #include <poll.h>
 #include <signal.h>
-#include <spawn.h>
 #include <sys/mman.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -67,49 +67,24 @@ std::string findProgram(const std::string& name) {
     return {};
 }
 
-class SpawnAttributes {
-public:
-    SpawnAttributes() {
-        ::posix_spawnattr_init(&attributes_);
-        ::posix_spawn_file_actions_init(&actions_);
-        // The host's own choices (an ignored SIGPIPE, a blocked SIGTERM) are none of the program's business.
-        sigset_t none;
-        sigset_t all;
-        ::sigemptyset(&none);
-        ::sigfillset(&all);
-        ::posix_spawnattr_setsigmask(&attributes_, &none);
-        ::posix_spawnattr_setsigdefault(&attributes_, &all);
-        ::posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
-    }
-    ~SpawnAttributes() {
-        ::posix_spawn_file_actions_destroy(&actions_);
-        ::posix_spawnattr_destroy(&attributes_);
-    }
-    SpawnAttributes(const SpawnAttributes&) = delete;
-    SpawnAttributes& operator=(const SpawnAttributes&) = delete;
-
-    int spawn(pid_t& pid, const std::string& program, const std::vector<std::string>& arguments,
-              const std::array<int, 3>& standard) {
-        // In a process whose own standard descriptors are closed, these have their numbers. They were opened
-        // in this order, so that no dup2 overwrites one that is still to come.
-        for (int i = 0; i < 3; ++i)
-            ::posix_spawn_file_actions_adddup2(&actions_, standard[static_cast<std::size_t>(i)], i);
-        ::posix_spawn_file_actions_addclosefrom_np(&actions_, STDERR_FILENO + 1);
-        std::vector<char*> argv;
-        argv.reserve(arguments.size() + 1);
-        for (const std::string& argument : arguments)
-            argv.push_back(const_cast<char*>(argument.c_str()));
-        argv.push_back(nullptr);
-        char path[] = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
-        char language[] = "LANG=C.UTF-8";
-        char* environment[] = {path, language, nullptr};
-        return ::posix_spawn(&pid, program.c_str(), &actions_, &attributes_, argv.data(), environment);
-    }
-
-private:
-    posix_spawnattr_t attributes_{};
-    posix_spawn_file_actions_t actions_{};
-};
+int spawn(pid_t& pid, const std::string& program, const std::vector<std::string>& arguments,
+          const std::array<int, 3>& standard) {
+    SpawnSetup setup;
+    // In a process whose own standard descriptors are closed, these have their numbers. They were opened in
+    // this order, so that no dup2 overwrites one that is still to come.
+    for (int i = 0; i < 3; ++i)
+        ::posix_spawn_file_actions_adddup2(&setup.actions, standard[static_cast<std::size_t>(i)], i);
+    ::posix_spawn_file_actions_addclosefrom_np(&setup.actions, STDERR_FILENO + 1);
+    std::vector<char*> argv;
+    argv.reserve(arguments.size() + 1);
+    for (const std::string& argument : arguments)
+        argv.push_back(const_cast<char*>(argument.c_str()));
+    argv.push_back(nullptr);
+    char path[] = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
+    char language[] = "LANG=C.UTF-8";
+    char* environment[] = {path, language, nullptr};
+    return ::posix_spawn(&pid, program.c_str(), &setup.actions, &setup.attributes, argv.data(), environment);
+}
 
 // Takes what stands in the pipe now. Past the limit it is read all the same, so that the writer does not
 // stall.
@@ -182,8 +157,7 @@ ProcessResult runProcess(const std::vector<std::string>& arguments, std::string_
     if (!in || !out.writeEnd || !err.writeEnd)
         return notStarted(arguments[0], errno);
     pid_t pid = -1;
-    const int error =
-        SpawnAttributes().spawn(pid, program, arguments, {in.get(), out.writeEnd.get(), err.writeEnd.get()});
+    const int error = spawn(pid, program, arguments, {in.get(), out.writeEnd.get(), err.writeEnd.get()});
     if (error != 0)
         return notStarted(arguments[0], error);
     out.writeEnd.reset();

@@ -1,5 +1,7 @@
 #include "standalone/ports/listening_sockets.h"
 
+#include "standalone/supervise/process_identity.h"
+
 #include <unistd.h>
 
 #include <algorithm>
@@ -103,22 +105,6 @@ std::string programOf(pid_t pid) {
     std::string name;
     std::getline(file, name);
     return name;
-}
-
-std::vector<pid_t> allPids() {
-    std::vector<pid_t> pids;
-    std::error_code error;
-    for (std::filesystem::directory_iterator entry("/proc", error), end; !error && entry != end;
-         entry.increment(error)) {
-        const std::string name = entry->path().filename().string();
-        pid_t pid = 0;
-        const auto [rest, problem] = std::from_chars(name.data(), name.data() + name.size(), pid);
-        if (problem == std::errc{} && rest == name.data() + name.size()) {
-            pids.push_back(pid);
-        }
-    }
-    std::sort(pids.begin(), pids.end());
-    return pids;
 }
 
 } // namespace

@@ -1,18 +1,17 @@
 #include "standalone/services/child_launcher.h"
 
 #include "standalone/core/input_wait.h"
+#include "standalone/core/spawn_setup.h"
 #include "standalone/core/unique_fd.h"
 #include "standalone/installed_files.h"
 
 #include <fcntl.h>
-#include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <array>
 #include <cerrno>
 #include <chrono>
-#include <csignal>
 #include <cstring>
 #include <optional>
 #include <string_view>
@@ -44,23 +43,11 @@ int spawnDetached(std::vector<std::string> arguments, int report) {
     pointers.push_back(nullptr);
     std::string path = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
     std::array<char*, 2> environment{path.data(), nullptr};
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_adddup2(&actions, report, reportDescriptor);
-    posix_spawnattr_t attributes;
-    posix_spawnattr_init(&attributes);
-    sigset_t none;
-    sigemptyset(&none);
-    sigset_t all;
-    sigfillset(&all);
-    posix_spawnattr_setsigmask(&attributes, &none);
-    posix_spawnattr_setsigdefault(&attributes, &all);
-    posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+    SpawnSetup setup;
+    ::posix_spawn_file_actions_adddup2(&setup.actions, report, reportDescriptor);
     pid_t pid = 0;
-    const int error =
-        ::posix_spawn(&pid, pointers[0], &actions, &attributes, pointers.data(), environment.data());
-    posix_spawnattr_destroy(&attributes);
-    posix_spawn_file_actions_destroy(&actions);
+    const int error = ::posix_spawn(&pid, pointers[0], &setup.actions, &setup.attributes, pointers.data(),
+                                    environment.data());
     if (error == 0) {
         int status = 0;
         while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {

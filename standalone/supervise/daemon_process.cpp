@@ -1,11 +1,11 @@
 #include "standalone/supervise/daemon_process.h"
 
+#include "standalone/core/spawn_setup.h"
 #include "standalone/ports/listening_sockets.h"
 #include "standalone/supervise/last_words.h"
 
 #include <fcntl.h>
 #include <poll.h>
-#include <spawn.h>
 #include <sys/wait.h>
 #include <syslog.h>
 #include <unistd.h>
@@ -23,35 +23,6 @@ namespace {
 
 constexpr std::size_t keptLines = 20; // the reason comes first, and advice after it
 constexpr std::size_t longestLine = 400;
-
-class SpawnSetup {
-public:
-    explicit SpawnSetup(int output) {
-        posix_spawn_file_actions_init(&actions);
-        posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-        posix_spawn_file_actions_adddup2(&actions, output, STDOUT_FILENO);
-        posix_spawn_file_actions_adddup2(&actions, output, STDERR_FILENO);
-        // The supervisor blocks the signals that it reads from a descriptor; the daemon must not inherit
-        // that.
-        posix_spawnattr_init(&attributes);
-        sigset_t none;
-        sigemptyset(&none);
-        sigset_t all;
-        sigfillset(&all);
-        posix_spawnattr_setsigmask(&attributes, &none);
-        posix_spawnattr_setsigdefault(&attributes, &all);
-        posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
-    }
-    ~SpawnSetup() {
-        posix_spawnattr_destroy(&attributes);
-        posix_spawn_file_actions_destroy(&actions);
-    }
-    SpawnSetup(const SpawnSetup&) = delete;
-    SpawnSetup& operator=(const SpawnSetup&) = delete;
-
-    posix_spawn_file_actions_t actions{};
-    posix_spawnattr_t attributes{};
-};
 
 /// The ports as people write them: "2121, 2122".
 std::string listPorts(const std::vector<int>& ports) {
@@ -101,7 +72,10 @@ std::string DaemonProcess::spawn(const DaemonOrder& order) {
     std::string path = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
     std::string language = "LANG=C.UTF-8";
     std::array<char*, 3> environment{path.data(), language.data(), nullptr};
-    SpawnSetup setup(writeEnd_);
+    SpawnSetup setup;
+    ::posix_spawn_file_actions_addopen(&setup.actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_, STDOUT_FILENO);
+    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_, STDERR_FILENO);
     pid_t pid = 0;
     const int error = ::posix_spawn(&pid, arguments[0], &setup.actions, &setup.attributes, arguments.data(),
                                     environment.data());

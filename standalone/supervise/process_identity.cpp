@@ -59,15 +59,7 @@ struct Relation {
 
 std::vector<Relation> allProcesses() {
     std::vector<Relation> all;
-    std::error_code error;
-    for (std::filesystem::directory_iterator entry("/proc", error), end; !error && entry != end;
-         entry.increment(error)) {
-        const std::string name = entry->path().filename().string();
-        pid_t pid = 0;
-        const auto [rest, problem] = std::from_chars(name.data(), name.data() + name.size(), pid);
-        if (problem != std::errc{} || rest != name.data() + name.size()) {
-            continue;
-        }
+    for (const pid_t pid : allPids()) {
         if (const auto stat = readStat(pid); stat && !hasEnded(*stat)) {
             all.push_back({{pid, stat->startTime}, stat->parent});
         }
@@ -92,6 +84,22 @@ std::vector<ProcessId> descendantsAmong(const std::vector<Relation>& all, pid_t 
 }
 
 } // namespace
+
+std::vector<pid_t> allPids() {
+    std::vector<pid_t> pids;
+    std::error_code error;
+    for (std::filesystem::directory_iterator entry("/proc", error), end; !error && entry != end;
+         entry.increment(error)) {
+        const std::string name = entry->path().filename().string();
+        pid_t pid = 0;
+        const auto [rest, problem] = std::from_chars(name.data(), name.data() + name.size(), pid);
+        if (problem == std::errc{} && rest == name.data() + name.size()) {
+            pids.push_back(pid);
+        }
+    }
+    std::sort(pids.begin(), pids.end());
+    return pids;
+}
 
 std::string bootId() {
     std::ifstream file("/proc/sys/kernel/random/boot_id");

@@ -25,6 +25,9 @@ struct ProcessId {
 /// only, so files that may outlive it note this beside one.
 std::string bootId();
 
+/// The numbers of all processes, in ascending order.
+std::vector<pid_t> allPids();
+
 /// The process that has this pid now; nothing when there is none or it has ended and only waits to be reaped.
 std::optional<ProcessId> identifyProcess(pid_t pid);
 
