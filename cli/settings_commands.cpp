@@ -88,7 +88,8 @@ void addGroup(CLI::App& app, Command& chosen, const std::string& title,
     area->require_subcommand(1);
     CLI::App* get = area->add_subcommand("get", "Show " + title);
     CLI::App* set = area->add_subcommand("set", "Change " + title + "; what is not named stays as it is");
-    set->add_option("key=value", options->words, "The settings to change")->required()->type_name("");
+    // Newer parsers accept no "=" in the name of an argument.
+    set->add_option("setting", options->words, "The settings to change")->required()->type_name("key=value");
     set->footer(footerOf(group));
     if (versioned) {
         for (CLI::App* command : {get, set}) {

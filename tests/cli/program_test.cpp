@@ -27,6 +27,13 @@ TEST_F(ProgramTest, EveryCommandExplainsItself) {
     EXPECT_TRUE(asked().empty());
 }
 
+TEST_F(ProgramTest, TheHelpOfSetNamesTheFormOfItsArguments) {
+    for (const char* area : {"ftp", "security", "sftp"}) {
+        const RunResult result = run({area, "set", "--help"});
+        EXPECT_NE(result.out.find("setting key=value ... REQUIRED"), std::string::npos) << result.out;
+    }
+}
+
 TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
     std::vector<std::string> words;
     for (const velt::cli::CommandDescription& command : velt::cli::describeCommands()) {
