@@ -1,7 +1,7 @@
 #include "cli/api_client.h"
 
-#include "cli/json_text.h"
-#include "cli/problem.h"
+#include "cli/json_io.h"
+#include "cli/server_refusal.h"
 
 #include <chrono>
 #include <thread>
@@ -37,12 +37,12 @@ Json::Value ApiClient::exchange(const std::string& method, const std::string& pa
         return {};
     }
     if (answer.status != 200 && answer.status != 201) {
-        throw problemOf(answer, endpoint());
+        throw failureFrom(answer, server());
     }
     std::string problem;
     const std::optional<Json::Value> value = parseJson(answer.body, problem);
     if (!value) {
-        throw Failure(ExitCode::access, "The answer from " + endpoint().name() + " is not JSON.",
+        throw Failure(ExitCode::access, "The answer from " + server().name() + " is not JSON.",
                       "Check that the address is that of veltd (--url, VELT_URL).");
     }
     return *value;
@@ -93,7 +93,7 @@ void ApiClient::follow(const std::string& path, const std::function<bool(std::st
     const HttpAnswer answer = http_.follow(path, onText, stop);
     // No status at all: stopped before the server answered.
     if (answer.status != 200 && answer.status != 0) {
-        throw problemOf(answer, endpoint());
+        throw failureFrom(answer, server());
     }
 }
 

@@ -22,7 +22,7 @@ inline constexpr const char* sftpApi = "VELT.Core.FileServ.FTP.SFTP";
 
 class ApiClient {
 public:
-    explicit ApiClient(Endpoint endpoint) : http_(std::move(endpoint)) {}
+    explicit ApiClient(ServerAddress server) : http_(std::move(server)) {}
 
     /// A method that takes no parameters and changes nothing.
     Json::Value read(const ApiMethod& method);
@@ -44,7 +44,7 @@ public:
     void follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
                 const std::function<bool()>& stop);
 
-    const Endpoint& endpoint() const { return http_.endpoint(); }
+    const ServerAddress& server() const { return http_.server(); }
 
 private:
     Json::Value exchange(const std::string& method, const std::string& path,

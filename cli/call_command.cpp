@@ -1,7 +1,7 @@
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/session.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -17,10 +17,10 @@ struct CallOptions {
     std::string parameters = "{}";
 };
 
-void listMethods(Session& session) {
-    const Json::Value answer = session.api.get("/api");
-    if (session.json) {
-        writeJson(session.console.out, answer);
+void listMethods(Context& context) {
+    const Json::Value answer = context.api.get("/api");
+    if (context.json) {
+        writeJson(context.console.out, answer);
         return;
     }
     Table table({"API", "VERSION", "METHOD", "CHANGES"});
@@ -28,19 +28,19 @@ void listMethods(Session& session) {
         table.add({textAt(row, "api"), textAt(row, "version"), textAt(row, "method"),
                    row["read"] == true ? "no" : "yes"});
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
 }
 
-void callMethod(Session& session, const CallOptions& options) {
+void callMethod(Context& context, const CallOptions& options) {
     if (options.list) {
-        listMethods(session);
+        listMethods(context);
         return;
     }
     if (options.method.method.empty()) {
         throw Failure(ExitCode::usage, "call needs API, VERSION and METHOD.",
                       "'veltctl call --list' shows what the server can do.");
     }
-    const std::string text = options.parameters == "-" ? readInput(session.console, "-") : options.parameters;
+    const std::string text = options.parameters == "-" ? readInput(context.console, "-") : options.parameters;
     std::string problem;
     const std::optional<Json::Value> parameters = parseJson(text, problem);
     if (!parameters || !parameters->isObject()) {
@@ -51,9 +51,9 @@ void callMethod(Session& session, const CallOptions& options) {
         }
         throw Failure(failure);
     }
-    const Json::Value answer = session.api.call(options.method, *parameters);
+    const Json::Value answer = context.api.call(options.method, *parameters);
     if (!answer.isNull()) {
-        writeJson(session.console.out, answer);
+        writeJson(context.console.out, answer);
     }
 }
 
@@ -71,7 +71,7 @@ void addCallCommand(CLI::App& app, Command& chosen) {
     call->add_option("parameters", options->parameters, "A JSON object, or - for the standard input")
         ->type_name("");
     call->callback(
-        [&chosen, options] { chosen = [options](Session& session) { callMethod(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { callMethod(context, *options); }; });
 }
 
 } // namespace velt::cli

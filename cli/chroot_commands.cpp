@@ -1,8 +1,8 @@
-#include "cli/chroot_rules.h"
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/session.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/rule_list.h"
+#include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -18,24 +18,24 @@ struct RuleOptions {
     std::string file;
 };
 
-void writeRules(Session& session, const ChrootRules& rules) {
-    if (session.json) {
+void writeRules(Context& context, const ChrootRules& rules) {
+    if (context.json) {
         Json::Value result;
         result["rules"] = rulesToJson(rules);
-        writeJson(session.console.out, result);
+        writeJson(context.console.out, result);
         return;
     }
     Table table({"TYPE", "NAME", "DIRECTORY"});
     for (const ChrootRule& rule : rules) {
         table.add({rule.type, rule.name, rule.path});
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
 }
 
-void showRules(Session& session) {
-    const Json::Value answer = session.api.read({chrootApi, 2, "load"});
-    if (session.json) {
-        writeJson(session.console.out, answer);
+void showRules(Context& context) {
+    const Json::Value answer = context.api.read({chrootApi, 2, "load"});
+    if (context.json) {
+        writeJson(context.console.out, answer);
         return;
     }
     Table table({"TYPE", "NAME", "DIRECTORY", "EXISTS"});
@@ -43,12 +43,12 @@ void showRules(Session& session) {
         table.add({textAt(rule, "type"), textAt(rule, "name"), textAt(rule, "path"),
                    rule["path_exist"] == true ? "yes" : "no"});
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
 }
 
-void replaceRules(Session& session, const RuleOptions& options) {
+void replaceRules(Context& context, const RuleOptions& options) {
     std::string problem;
-    const std::optional<Json::Value> document = parseJson(readInput(session.console, options.file), problem);
+    const std::optional<Json::Value> document = parseJson(readInput(context.console, options.file), problem);
     if (!document) {
         throw Failure(ExitCode::refused, options.file + " is not JSON.", "Correct it; nothing was changed.",
                       {problem});
@@ -65,11 +65,11 @@ void replaceRules(Session& session, const RuleOptions& options) {
         }
         throw Failure(failure);
     }
-    session.api.changeWhatWasRead([&] { saveRules(session.api, rules, loadRules(session.api)); });
-    writeRules(session, rules);
+    context.api.changeWhatWasRead([&] { saveRules(context.api, rules, loadRules(context.api)); });
+    writeRules(context, rules);
 }
 
-void addRule(Session& session, const RuleOptions& options) {
+void addRule(Context& context, const RuleOptions& options) {
     std::vector<std::string> faults;
     rulesFromJson(rulesToJson({options.rule}), faults);
     if (!faults.empty()) {
@@ -77,15 +77,15 @@ void addRule(Session& session, const RuleOptions& options) {
                       "For example: veltctl chroot rules add user NAME /SHARE");
     }
     ChrootRules rules;
-    session.api.changeWhatWasRead([&] {
-        const ChrootRules before = loadRules(session.api);
+    context.api.changeWhatWasRead([&] {
+        const ChrootRules before = loadRules(context.api);
         rules = before;
         if (std::find(rules.begin(), rules.end(), options.rule) == rules.end()) {
             rules.push_back(options.rule);
-            saveRules(session.api, rules, before);
+            saveRules(context.api, rules, before);
         }
     });
-    writeRules(session, rules);
+    writeRules(context, rules);
 }
 
 // The rules without those that the options name; Failure when there is none of these.
@@ -103,14 +103,14 @@ ChrootRules rulesWithout(ChrootRules rules, const ChrootRule& wanted) {
     return rules;
 }
 
-void removeRule(Session& session, const RuleOptions& options) {
+void removeRule(Context& context, const RuleOptions& options) {
     ChrootRules rules;
-    session.api.changeWhatWasRead([&] {
-        const ChrootRules before = loadRules(session.api);
+    context.api.changeWhatWasRead([&] {
+        const ChrootRules before = loadRules(context.api);
         rules = rulesWithout(before, options.rule);
-        saveRules(session.api, rules, before);
+        saveRules(context.api, rules, before);
     });
-    writeRules(session, rules);
+    writeRules(context, rules);
 }
 
 struct UserOptions {
@@ -123,7 +123,7 @@ struct UserOptions {
     std::vector<std::string> names;
 };
 
-void listUsers(Session& session, const UserOptions& options) {
+void listUsers(Context& context, const UserOptions& options) {
     Json::Value parameters;
     parameters["chroot"] = !options.others;
     parameters["offset"] = options.offset;
@@ -135,31 +135,31 @@ void listUsers(Session& session, const UserOptions& options) {
     if (!options.filter.empty()) {
         parameters["substr"] = options.filter;
     }
-    const Json::Value answer = session.api.call({chrootApi, 1, "list"}, parameters);
-    if (session.json) {
-        writeJson(session.console.out, answer);
+    const Json::Value answer = context.api.call({chrootApi, 1, "list"}, parameters);
+    if (context.json) {
+        writeJson(context.console.out, answer);
         return;
     }
     Table table({"USER", "DESCRIPTION"});
     for (const Json::Value& user : answer["user"]) {
         table.add({textAt(user, "name"), textAt(user, "descr")});
     }
-    table.write(session.console.out);
-    session.console.out << answer["user"].size() << " of " << textAt(answer, "total") << " users\n";
+    table.write(context.console.out);
+    context.console.out << answer["user"].size() << " of " << textAt(answer, "total") << " users\n";
 }
 
-void changeUsers(Session& session, const UserOptions& options, const char* method, const char* sentence) {
+void changeUsers(Context& context, const UserOptions& options, const char* method, const char* sentence) {
     Json::Value parameters;
     for (const std::string& name : options.names) {
         parameters["id"].append(name);
     }
-    const Json::Value answer = session.api.call({chrootApi, 1, method}, parameters);
-    if (session.json) {
-        writeJson(session.console.out, answer.isNull() ? parameters : answer);
+    const Json::Value answer = context.api.call({chrootApi, 1, method}, parameters);
+    if (context.json) {
+        writeJson(context.console.out, answer.isNull() ? parameters : answer);
         return;
     }
     for (const std::string& name : options.names) {
-        session.console.out << printable(name) << sentence << '\n';
+        context.console.out << printable(name) << sentence << '\n';
     }
 }
 
@@ -177,7 +177,7 @@ void addUserCommands(CLI::App& chroot, Command& chosen) {
     list->add_option("--domain", options->domain, "Users of this domain")->type_name("NAME");
     list->add_option("--filter", options->filter, "Users whose name holds this text")->type_name("TEXT");
     list->callback(
-        [&chosen, options] { chosen = [options](Session& session) { listUsers(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { listUsers(context, *options); }; });
 
     CLI::App* add = users->add_subcommand("add", "Confine users to their home folders");
     CLI::App* remove = users->add_subcommand("delete", "Lift the confinement of users");
@@ -185,11 +185,11 @@ void addUserCommands(CLI::App& chroot, Command& chosen) {
         command->add_option("user", options->names, "Names of users")->required()->type_name("");
     }
     add->callback([&chosen, options] {
-        chosen = [options](Session& session) { changeUsers(session, *options, "add", ": confined"); };
+        chosen = [options](Context& context) { changeUsers(context, *options, "add", ": confined"); };
     });
     remove->callback([&chosen, options] {
-        chosen = [options](Session& session) {
-            changeUsers(session, *options, "delete", ": no longer confined");
+        chosen = [options](Context& context) {
+            changeUsers(context, *options, "delete", ": no longer confined");
         };
     });
 }
@@ -206,7 +206,7 @@ void addRuleCommands(CLI::App& chroot, Command& chosen) {
         ->required()
         ->type_name("");
     save->callback(
-        [&chosen, options] { chosen = [options](Session& session) { replaceRules(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { replaceRules(context, *options); }; });
 
     CLI::App* add = rules->add_subcommand("add", "Add a rule");
     CLI::App* remove = rules->add_subcommand("remove", "Remove the rules of a user or group");
@@ -224,9 +224,9 @@ void addRuleCommands(CLI::App& chroot, Command& chosen) {
         ->type_name("");
     remove->add_option("directory", options->rule.path, "Only the rule with this directory")->type_name("");
     add->callback(
-        [&chosen, options] { chosen = [options](Session& session) { addRule(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { addRule(context, *options); }; });
     remove->callback(
-        [&chosen, options] { chosen = [options](Session& session) { removeRule(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { removeRule(context, *options); }; });
 }
 
 } // namespace

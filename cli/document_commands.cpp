@@ -1,8 +1,8 @@
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/session.h"
+#include "cli/json_io.h"
 #include "cli/settings_document.h"
-#include "cli/table.h"
+#include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -19,10 +19,10 @@ struct DocumentOptions {
     bool dryRun = false;
 };
 
-void exportTo(Session& session, const std::string& name) {
-    const Json::Value document = exportSettings(session.api);
+void exportTo(Context& context, const std::string& name) {
+    const Json::Value document = exportSettings(context.api);
     if (name.empty()) {
-        writeJson(session.console.out, document);
+        writeJson(context.console.out, document);
         return;
     }
     std::ofstream file(name, std::ios::binary | std::ios::trunc);
@@ -34,9 +34,9 @@ void exportTo(Session& session, const std::string& name) {
     }
 }
 
-Json::Value readDocument(Session& session, const std::string& name) {
+Json::Value readDocument(Context& context, const std::string& name) {
     std::string problem;
-    const std::optional<Json::Value> document = parseJson(readInput(session.console, name), problem);
+    const std::optional<Json::Value> document = parseJson(readInput(context.console, name), problem);
     if (!document) {
         throw Failure(ExitCode::refused, name + " is not JSON.", "Correct it; nothing was changed.",
                       {problem});
@@ -53,15 +53,15 @@ Json::Value readDocument(Session& session, const std::string& name) {
     return *document;
 }
 
-void writeStep(Session& session, const ImportStep& step) {
+void writeStep(Context& context, const ImportStep& step) {
     for (const std::string& change : step.changes) {
-        session.console.out << step.section << "  " << change << '\n';
+        context.console.out << step.section << "  " << change << '\n';
     }
-    session.console.out.flush();
+    context.console.out.flush();
 }
 
-void writeResult(Session& session, const ImportPlan& plan, std::size_t applied, bool dryRun) {
-    if (session.json) {
+void writeResult(Context& context, const ImportPlan& plan, std::size_t applied, bool dryRun) {
+    if (context.json) {
         Json::Value result;
         result["dry_run"] = dryRun;
         result["sections"] = Json::Value(Json::arrayValue);
@@ -72,22 +72,22 @@ void writeResult(Session& session, const ImportPlan& plan, std::size_t applied, 
             section["applied"] = i < applied;
             result["sections"].append(section);
         }
-        writeJson(session.console.out, result);
+        writeJson(context.console.out, result);
     } else if (plan.steps.empty()) {
-        session.console.out << "Nothing to change.\n";
+        context.console.out << "Nothing to change.\n";
     } else if (dryRun) {
-        session.console.out << "Nothing was changed: this was a dry run.\n";
+        context.console.out << "Nothing was changed: this was a dry run.\n";
     }
 }
 
-void applySteps(Session& session, const ImportPlan& plan) {
+void applySteps(Context& context, const ImportPlan& plan) {
     std::size_t applied = 0;
     try {
         for (const ImportStep& step : plan.steps) {
             step.apply();
             ++applied;
-            if (!session.json) {
-                writeStep(session, step);
+            if (!context.json) {
+                writeStep(context, step);
             }
         }
     } catch (Failure& failure) {
@@ -97,25 +97,25 @@ void applySteps(Session& session, const ImportPlan& plan) {
                 failure.note(plan.steps[i].section + (i < applied ? ": was applied" : ": was not applied"));
             }
         }
-        writeResult(session, plan, applied, false);
+        writeResult(context, plan, applied, false);
         throw;
     }
-    writeResult(session, plan, applied, false);
+    writeResult(context, plan, applied, false);
 }
 
-void importFrom(Session& session, const DocumentOptions& options) {
-    const Json::Value document = readDocument(session, options.file);
-    const ImportPlan plan = planImport(session.api, document);
+void importFrom(Context& context, const DocumentOptions& options) {
+    const Json::Value document = readDocument(context, options.file);
+    const ImportPlan plan = planImport(context.api, document);
     if (!options.dryRun) {
-        applySteps(session, plan);
+        applySteps(context, plan);
         return;
     }
-    if (!session.json) {
+    if (!context.json) {
         for (const ImportStep& step : plan.steps) {
-            writeStep(session, step);
+            writeStep(context, step);
         }
     }
-    writeResult(session, plan, 0, true);
+    writeResult(context, plan, 0, true);
 }
 
 } // namespace
@@ -126,7 +126,7 @@ void addDocumentCommands(CLI::App& app, Command& chosen) {
     save->add_option("-o,--output", options->file, "The file to write (default: the standard output)")
         ->type_name("FILE");
     save->callback(
-        [&chosen, options] { chosen = [options](Session& session) { exportTo(session, options->file); }; });
+        [&chosen, options] { chosen = [options](Context& context) { exportTo(context, options->file); }; });
 
     CLI::App* load =
         app.add_subcommand("import", "Bring the settings to those of a document, and say what changes");
@@ -135,7 +135,7 @@ void addDocumentCommands(CLI::App& app, Command& chosen) {
         ->type_name("");
     load->add_flag("-n,--dry-run", options->dryRun, "Only say what would change");
     load->callback(
-        [&chosen, options] { chosen = [options](Session& session) { importFrom(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { importFrom(context, *options); }; });
 }
 
 } // namespace velt::cli

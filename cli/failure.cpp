@@ -1,6 +1,6 @@
 #include "cli/failure.h"
 
-#include "cli/table.h"
+#include "cli/text_table.h"
 
 #include <ostream>
 

@@ -70,7 +70,7 @@ void initialiseLibrary() {
     static const Library library;
 }
 
-std::string hintFor(const Endpoint& endpoint, CURLcode code, long systemError) {
+std::string hintFor(const ServerAddress& server, CURLcode code, long systemError) {
     if (code == CURLE_OPERATION_TIMEDOUT) {
         return "The request may still take effect: look with 'veltctl status', or wait longer with "
                "--timeout.";
@@ -78,7 +78,7 @@ std::string hintFor(const Endpoint& endpoint, CURLcode code, long systemError) {
     if (code == CURLE_PEER_FAILED_VERIFICATION || code == CURLE_SSL_CACERT_BADFILE) {
         return "Name the certificate that signed the server's with --ca-file.";
     }
-    if (endpoint.socket.empty()) {
+    if (server.socket.empty()) {
         return "Check the address (--url, VELT_URL) and that veltd listens there.";
     }
     if (systemError == EACCES || systemError == EPERM) {
@@ -88,11 +88,11 @@ std::string hintFor(const Endpoint& endpoint, CURLcode code, long systemError) {
            "VELT_URL.";
 }
 
-Failure noAnswer(const Endpoint& endpoint, CURL* curl, CURLcode code, const char* reason) {
+Failure noAnswer(const ServerAddress& server, CURL* curl, CURLcode code, const char* reason) {
     long systemError = 0;
     curl_easy_getinfo(curl, CURLINFO_OS_ERRNO, &systemError);
-    Failure failure(ExitCode::access, "No answer from " + endpoint.name() + ".",
-                    hintFor(endpoint, code, systemError));
+    Failure failure(ExitCode::access, "No answer from " + server.name() + ".",
+                    hintFor(server, code, systemError));
     const bool connecting = code == CURLE_COULDNT_CONNECT && systemError != 0;
     failure.note(connecting ? std::strerror(static_cast<int>(systemError))
                             : (*reason != '\0' ? reason : curl_easy_strerror(code)));
@@ -124,7 +124,7 @@ struct HttpClient::Handle {
     }
 };
 
-HttpClient::HttpClient(Endpoint endpoint) : endpoint_(std::move(endpoint)) {
+HttpClient::HttpClient(ServerAddress server) : server_(std::move(server)) {
     initialiseLibrary();
     handle_ = std::make_unique<Handle>();
     if (handle_->curl == nullptr) {
@@ -143,7 +143,7 @@ void HttpClient::prepare(const std::string& path) {
     handle_->transfer.curl = curl;
     handle_->reason[0] = '\0';
 
-    curl_easy_setopt(curl, CURLOPT_URL, (endpoint_.url + path).c_str());
+    curl_easy_setopt(curl, CURLOPT_URL, (server_.url + path).c_str());
     curl_easy_setopt(curl, CURLOPT_PROTOCOLS_STR, "http,https");
     // A proxy from the environment would see the token, and a proxy cannot reach the loopback of this
     // machine.
@@ -153,14 +153,14 @@ void HttpClient::prepare(const std::string& path) {
     curl_easy_setopt(curl, CURLOPT_CONNECTTIMEOUT, connectSeconds);
     curl_easy_setopt(curl, CURLOPT_WRITEFUNCTION, &onData);
     curl_easy_setopt(curl, CURLOPT_WRITEDATA, &handle_->transfer);
-    if (!endpoint_.socket.empty()) {
-        curl_easy_setopt(curl, CURLOPT_UNIX_SOCKET_PATH, endpoint_.socket.c_str());
+    if (!server_.socket.empty()) {
+        curl_easy_setopt(curl, CURLOPT_UNIX_SOCKET_PATH, server_.socket.c_str());
     }
-    if (!endpoint_.caFile.empty()) {
-        curl_easy_setopt(curl, CURLOPT_CAINFO, endpoint_.caFile.c_str());
+    if (!server_.caFile.empty()) {
+        curl_easy_setopt(curl, CURLOPT_CAINFO, server_.caFile.c_str());
     }
-    if (!endpoint_.token.empty()) {
-        handle_->addHeader("Authorization: Bearer " + endpoint_.token);
+    if (!server_.token.empty()) {
+        handle_->addHeader("Authorization: Bearer " + server_.token);
     }
     handle_->addHeader("Expect:"); // a second round trip for nothing
 }
@@ -174,7 +174,7 @@ void HttpClient::perform(bool mayBeStopped) {
         std::rethrow_exception(transfer.exception);
     }
     if (code != CURLE_OK && !(mayBeStopped && transfer.stopped)) {
-        throw noAnswer(endpoint_, curl, code, handle_->reason);
+        throw noAnswer(server_, curl, code, handle_->reason);
     }
     curl_easy_getinfo(curl, CURLINFO_RESPONSE_CODE, &transfer.answer.status);
     curl_header* etag = nullptr;
@@ -187,7 +187,7 @@ HttpAnswer HttpClient::send(const std::string& method, const std::string& path,
                             const std::optional<std::string>& body, const std::string& ifMatch) {
     prepare(path);
     CURL* curl = handle_->curl;
-    curl_easy_setopt(curl, CURLOPT_TIMEOUT, static_cast<long>(endpoint_.timeoutSeconds));
+    curl_easy_setopt(curl, CURLOPT_TIMEOUT, static_cast<long>(server_.timeoutSeconds));
     handle_->addHeader("Accept: application/json, application/problem+json");
     if (!ifMatch.empty()) {
         handle_->addHeader("If-Match: " + ifMatch);

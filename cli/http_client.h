@@ -2,7 +2,7 @@
 #ifndef VELT_CLI_HTTP_CLIENT_H
 #define VELT_CLI_HTTP_CLIENT_H
 
-#include "cli/endpoint.h"
+#include "cli/server_address.h"
 
 #include <functional>
 #include <memory>
@@ -21,12 +21,12 @@ struct HttpAnswer {
 /// Not for use by several threads at once.
 class HttpClient {
 public:
-    explicit HttpClient(Endpoint endpoint);
+    explicit HttpClient(ServerAddress server);
     ~HttpClient();
     HttpClient(const HttpClient&) = delete;
     HttpClient& operator=(const HttpClient&) = delete;
 
-    const Endpoint& endpoint() const { return endpoint_; }
+    const ServerAddress& server() const { return server_; }
 
     /// Sends one request; `path` starts with a slash and is encoded already, `body` is JSON. With an
     /// `ifMatch` the server is to refuse when it is in another state. Any status is an answer. Throws Failure
@@ -46,7 +46,7 @@ private:
     void prepare(const std::string& path);
     void perform(bool mayBeStopped);
 
-    Endpoint endpoint_;
+    ServerAddress server_;
     std::unique_ptr<Handle> handle_;
 };
 

@@ -1,8 +1,8 @@
-#include "cli/event_stream.h"
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/session.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/server_events.h"
+#include "cli/text_table.h"
 #include "cli/time_text.h"
 
 #include <CLI/CLI.hpp>
@@ -54,12 +54,12 @@ std::string timeOf(const Json::Value& entry) {
     return time.isIntegral() ? utcText(static_cast<std::time_t>(time.asInt64())) : displayValue(time);
 }
 
-void writeLog(Session& session, const Json::Value& entries, const Json::Value& next) {
-    if (session.json) {
+void writeLog(Context& context, const Json::Value& entries, const Json::Value& next) {
+    if (context.json) {
         Json::Value result;
         result["entries"] = entries;
         result["next"] = next;
-        writeJson(session.console.out, result);
+        writeJson(context.console.out, result);
         return;
     }
     Table table({"ID", "TIME", "EVENT", "ACTOR", "ADDRESS", "TEXT"});
@@ -67,18 +67,18 @@ void writeLog(Session& session, const Json::Value& entries, const Json::Value& n
         table.add({textAt(entry, "id"), timeOf(entry), textAt(entry, "event"), textAt(entry, "actor"),
                    textAt(entry, "address"), textAt(entry, "text")});
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
     if (!next.isNull()) {
-        session.console.err << "Older entries: veltctl log --before " << printable(displayValue(next))
+        context.console.err << "Older entries: veltctl log --before " << printable(displayValue(next))
                             << " (with the same filters), or --all\n";
     }
 }
 
-void showLog(Session& session, LogOptions options) {
+void showLog(Context& context, LogOptions options) {
     Json::Value entries(Json::arrayValue);
     Json::Value next;
     do {
-        const Json::Value page = session.api.get(logPath(options));
+        const Json::Value page = context.api.get(logPath(options));
         for (const Json::Value& entry : page["entries"]) {
             entries.append(entry);
         }
@@ -86,7 +86,7 @@ void showLog(Session& session, LogOptions options) {
         next = displayValue(page["next"]) == options.before ? Json::Value() : page["next"];
         options.before = displayValue(next);
     } while (options.all && !next.isNull());
-    writeLog(session, entries, next);
+    writeLog(context, entries, next);
 }
 
 // An event's number as the server writes it: hexadecimal or decimal, in any case.
@@ -97,12 +97,12 @@ unsigned long eventNumber(const std::string& text) {
 // The entries as they come, one on a line.
 class FollowedLog {
 public:
-    FollowedLog(Session& session, const LogOptions& options) : session_(session), options_(options) {}
+    FollowedLog(Context& context, const LogOptions& options) : context_(context), options_(options) {}
 
     // The newest entries so far, in the order in which they came.
     void begin() {
         // The connection that follows is in use.
-        ApiClient api(session_.api.endpoint());
+        ApiClient api(context_.api.server());
         const Json::Value page = api.get(logPath(options_));
         for (Json::ArrayIndex i = page["entries"].size(); i > 0; --i) {
             write(page["entries"][i - 1]);
@@ -129,8 +129,8 @@ private:
             return;
         }
         last_ = entry["id"].asInt64();
-        std::ostream& out = session_.console.out;
-        if (session_.json) {
+        std::ostream& out = context_.console.out;
+        if (context_.json) {
             out << compactJson(entry) << '\n';
         } else {
             const char* gap = "  ";
@@ -141,17 +141,17 @@ private:
         out.flush();
     }
 
-    Session& session_;
+    Context& context_;
     const LogOptions& options_;
     std::int64_t last_ = 0;
 };
 
-void followLog(Session& session, const LogOptions& options) {
-    FollowedLog log(session, options);
+void followLog(Context& context, const LogOptions& options) {
+    FollowedLog log(context, options);
     EventStream stream([&log](const std::string& event, const std::string& data) { log.take(event, data); });
-    session.console.watchInterruptions();
+    context.console.watchInterruptions();
     bool begun = false;
-    session.api.follow(
+    context.api.follow(
         "/events",
         [&](std::string_view piece) {
             // Only once the stream is there: what is written in between is on the page then.
@@ -160,10 +160,10 @@ void followLog(Session& session, const LogOptions& options) {
                 log.begin();
             }
             stream.feed(piece);
-            return session.console.out.good();
+            return context.console.out.good();
         },
-        session.console.interrupted);
-    if (session.console.out.good() && !session.console.interrupted()) {
+        context.console.interrupted);
+    if (context.console.out.good() && !context.console.interrupted()) {
         throw Failure(ExitCode::access, "The server ended the stream of events.",
                       "Check with 'veltctl status' that it runs, then follow the log again.");
     }
@@ -191,8 +191,8 @@ void addLogCommand(CLI::App& app, Command& chosen) {
         ->excludes(before)
         ->excludes(all);
     log->callback([&chosen, options] {
-        chosen = [options](Session& session) {
-            options->follow ? followLog(session, *options) : showLog(session, *options);
+        chosen = [options](Context& context) {
+            options->follow ? followLog(context, *options) : showLog(context, *options);
         };
     });
 }

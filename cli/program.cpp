@@ -1,7 +1,7 @@
 #include "cli/program.h"
 
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/session.h"
 
 #include <CLI/CLI.hpp>
 
@@ -17,24 +17,23 @@ constexpr const char* exitCodes =
     "6 no connection or access.";
 
 struct GlobalOptions {
-    EndpointOptions endpoint;
+    AddressOptions server;
     bool json = false;
 };
 
 void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
     app.add_flag("--json", options.json, "Write JSON, for programs");
-    CLI::Option* url = app.add_option("--url", options.endpoint.url, "Address of the server (or VELT_URL)")
-                           ->type_name("URL");
-    app.add_option("--socket", options.endpoint.socket,
+    CLI::Option* url =
+        app.add_option("--url", options.server.url, "Address of the server (or VELT_URL)")->type_name("URL");
+    app.add_option("--socket", options.server.socket,
                    std::string("Unix socket of the server (or VELT_SOCKET, default ") + defaultSocket + ")")
         ->type_name("PATH")
         ->excludes(url);
-    app.add_option("--token-file", options.endpoint.tokenFile,
+    app.add_option("--token-file", options.server.tokenFile,
                    "File with the token (or the token in VELT_TOKEN)")
         ->type_name("FILE");
-    app.add_option("--ca-file", options.endpoint.caFile, "Certificates to trust for https")
-        ->type_name("FILE");
-    app.add_option("--timeout", options.endpoint.timeoutSeconds, "Seconds to wait for an answer (default 60)")
+    app.add_option("--ca-file", options.server.caFile, "Certificates to trust for https")->type_name("FILE");
+    app.add_option("--timeout", options.server.timeoutSeconds, "Seconds to wait for an answer (default 60)")
         ->check(CLI::Range(1, 86400))
         ->type_name("SECONDS");
 }
@@ -78,10 +77,10 @@ ExitCode endOfParsing(const CLI::App& app, const CLI::ParseError& error, Console
 }
 
 void runCommand(const Command& command, const GlobalOptions& options, Console& console) {
-    ApiClient api(findEndpoint(options.endpoint, console));
-    Session session{console, api, options.json};
+    ApiClient api(findServer(options.server, console));
+    Context context{console, api, options.json};
     try {
-        command(session);
+        command(context);
     } catch (const Json::Exception&) {
         throw Failure(ExitCode::platform, "The server's answer has a form that veltctl does not know.",
                       "Check that the server is of the same release as veltctl.");

@@ -1,9 +1,9 @@
 #include "cli/settings_commands.h"
 
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/stored_switches.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
+#include "cli/wanted_services.h"
 
 #include <CLI/CLI.hpp>
 
@@ -26,38 +26,38 @@ std::vector<Change> differences(const SettingGroup& group, const Json::Value& be
 }
 
 // Some values are accepted and passed over, such as a UTF-8 switch without UTF-8 support.
-void warnOfKeptValues(Session& session, const Json::Value& wanted, const Json::Value& after) {
+void warnOfKeptValues(Context& context, const Json::Value& wanted, const Json::Value& after) {
     for (const std::string& key : wanted.getMemberNames()) {
         if (after[key] != wanted[key]) {
-            session.console.err << "veltctl: warning: the server accepted " << key << "="
+            context.console.err << "veltctl: warning: the server accepted " << key << "="
                                 << printable(displayValue(wanted[key])) << ", but shows "
                                 << printable(displayValue(after[key])) << ".\n";
         }
     }
 }
 
-void writeChanges(Session& session, const std::vector<Change>& changes, const Json::Value& after) {
-    if (session.json) {
+void writeChanges(Context& context, const std::vector<Change>& changes, const Json::Value& after) {
+    if (context.json) {
         Json::Value result;
         result["changed"] = Json::Value(Json::arrayValue);
         for (const Change& change : changes) {
             result["changed"].append(changeToJson(change));
         }
         result["settings"] = after;
-        writeJson(session.console.out, result);
+        writeJson(context.console.out, result);
         return;
     }
     for (const Change& change : changes) {
-        session.console.out << changeToText(change) << '\n';
+        context.console.out << changeToText(change) << '\n';
     }
     if (changes.empty()) {
-        session.console.out << "Nothing changed.\n";
+        context.console.out << "Nothing changed.\n";
     }
 }
 
-Json::Value readBack(Session& session, const SettingGroup& group) {
+Json::Value readBack(Context& context, const SettingGroup& group) {
     try {
-        return readSettings(session.api, group);
+        return readSettings(context.api, group);
     } catch (Failure& failure) {
         failure.note("The change itself was accepted; only reading it back failed.");
         throw;
@@ -100,11 +100,11 @@ void addGroup(CLI::App& app, Command& chosen, const std::string& title,
         }
     }
     get->callback([&chosen, options, groupOf] {
-        chosen = [options, groupOf](Session& session) { showSettings(session, groupOf(options->version)); };
+        chosen = [options, groupOf](Context& context) { showSettings(context, groupOf(options->version)); };
     });
     set->callback([&chosen, options, groupOf] {
-        chosen = [options, groupOf](Session& session) {
-            changeSettings(session, groupOf(options->version), options->words);
+        chosen = [options, groupOf](Context& context) {
+            changeSettings(context, groupOf(options->version), options->words);
         };
     });
 }
@@ -124,10 +124,10 @@ Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
     return current;
 }
 
-void showSettings(Session& session, const SettingGroup& group) {
-    const Json::Value current = readSettings(session.api, group);
-    if (session.json) {
-        writeJson(session.console.out, current);
+void showSettings(Context& context, const SettingGroup& group) {
+    const Json::Value current = readSettings(context.api, group);
+    if (context.json) {
+        writeJson(context.console.out, current);
         return;
     }
     Table table({"SETTING", "VALUE", "MEANING"});
@@ -136,25 +136,25 @@ void showSettings(Session& session, const SettingGroup& group) {
             table.add({setting.key, displayValue(current[setting.key]), setting.meaning});
         }
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
 }
 
-void changeSettings(Session& session, const SettingGroup& group, const std::vector<std::string>& words) {
+void changeSettings(Context& context, const SettingGroup& group, const std::vector<std::string>& words) {
     const Json::Value wanted = parseAssignments(group, words);
     Json::Value before;
     std::vector<std::string> doubts;
-    session.api.changeWhatWasRead([&] {
-        before = readSettings(session.api, group);
-        const StoredSwitches switches = readStoredSwitches(session.api, group, wanted, before);
+    context.api.changeWhatWasRead([&] {
+        before = readSettings(context.api, group);
+        const StoredSwitches switches = readStoredSwitches(context.api, group, wanted, before);
         doubts = switches.doubts;
-        session.api.call(group.method("set"), completeChange(group, wanted, switches.values));
+        context.api.call(group.method("set"), completeChange(group, wanted, switches.values));
     });
-    const Json::Value after = readBack(session, group);
-    writeChanges(session, differences(group, before, after), after);
+    const Json::Value after = readBack(context, group);
+    writeChanges(context, differences(group, before, after), after);
     for (const std::string& doubt : doubts) {
-        session.console.err << "veltctl: warning: " << printable(doubt) << '\n';
+        context.console.err << "veltctl: warning: " << printable(doubt) << '\n';
     }
-    warnOfKeptValues(session, wanted, after);
+    warnOfKeptValues(context, wanted, after);
 }
 
 Json::Value changeToJson(const Change& change) {

@@ -2,7 +2,7 @@
 #ifndef VELT_CLI_SETTINGS_COMMANDS_H
 #define VELT_CLI_SETTINGS_COMMANDS_H
 
-#include "cli/session.h"
+#include "cli/command.h"
 #include "cli/setting.h"
 
 namespace velt::cli {
@@ -18,11 +18,11 @@ struct Change {
 Json::Value readSettings(ApiClient& api, const SettingGroup& group);
 
 /// Writes the settings.
-void showSettings(Session& session, const SettingGroup& group);
+void showSettings(Context& context, const SettingGroup& group);
 
 /// Changes the settings that words of the form key=value name and writes what is different afterwards. A
 /// value that the server accepted but does not show is told on the error output.
-void changeSettings(Session& session, const SettingGroup& group, const std::vector<std::string>& words);
+void changeSettings(Context& context, const SettingGroup& group, const std::vector<std::string>& words);
 
 /// As {"key", "from", "to"}.
 Json::Value changeToJson(const Change& change);

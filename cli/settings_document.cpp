@@ -1,8 +1,8 @@
 #include "cli/settings_document.h"
 
 #include "cli/failure.h"
-#include "cli/stored_switches.h"
-#include "cli/table.h"
+#include "cli/text_table.h"
+#include "cli/wanted_services.h"
 
 #include <algorithm>
 #include <charconv>

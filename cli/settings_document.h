@@ -2,7 +2,7 @@
 #ifndef VELT_CLI_SETTINGS_DOCUMENT_H
 #define VELT_CLI_SETTINGS_DOCUMENT_H
 
-#include "cli/chroot_rules.h"
+#include "cli/rule_list.h"
 #include "cli/settings_commands.h"
 
 namespace velt::cli {

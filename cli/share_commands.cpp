@@ -1,6 +1,6 @@
-#include "cli/json_text.h"
-#include "cli/session.h"
-#include "cli/table.h"
+#include "cli/command.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -8,17 +8,17 @@ namespace velt::cli {
 
 namespace {
 
-void listShares(Session& session) {
-    const Json::Value answer = session.api.read({securityApi, 1, "list_ftp_share"});
-    if (session.json) {
-        writeJson(session.console.out, answer);
+void listShares(Context& context) {
+    const Json::Value answer = context.api.read({securityApi, 1, "list_ftp_share"});
+    if (context.json) {
+        writeJson(context.console.out, answer);
         return;
     }
     Table table({"SHARE"});
     for (const Json::Value& share : answer["share"]) {
         table.add({displayValue(share)});
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
 }
 
 } // namespace

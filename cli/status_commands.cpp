@@ -1,8 +1,8 @@
-#include "cli/event_stream.h"
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/session.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/server_events.h"
+#include "cli/text_table.h"
 #include "cli/time_text.h"
 
 #include <CLI/CLI.hpp>
@@ -26,33 +26,33 @@ std::string stateOf(const Json::Value& service) {
 }
 
 /// Why services do not follow their settings; those of one daemon have one reason.
-void writeReasons(Session& session, const Json::Value& services) {
+void writeReasons(Context& context, const Json::Value& services) {
     std::string last;
     for (const Json::Value& service : services) {
         const bool given = service.isObject() && service["reason"].isString();
         const std::string reason = given ? service["reason"].asString() : "";
         if (!reason.empty() && reason != last) {
-            session.console.out << '\n'
+            context.console.out << '\n'
                                 << printable(textAt(service, "name")) << ": " << printable(reason) << '\n';
         }
         last = reason;
     }
 }
 
-void showStatus(Session& session) {
-    const Json::Value status = session.api.get("/api/status");
-    if (session.json) {
-        writeJson(session.console.out, status);
+void showStatus(Context& context) {
+    const Json::Value status = context.api.get("/api/status");
+    if (context.json) {
+        writeJson(context.console.out, status);
         return;
     }
-    session.console.out << "veltd " << printable(textAt(status, "version")) << ", up for "
+    context.console.out << "veltd " << printable(textAt(status, "version")) << ", up for "
                         << durationText(status["uptime_seconds"].asInt64()) << "\n\n";
     Table table({"SERVICE", "STATE", "PORT"});
     for (const Json::Value& service : status["services"]) {
         table.add({textAt(service, "name"), stateOf(service), textAt(service, "port")});
     }
-    table.write(session.console.out);
-    writeReasons(session, status["services"]);
+    table.write(context.console.out);
+    writeReasons(context, status["services"]);
 }
 
 struct EventOptions {
@@ -75,22 +75,22 @@ std::string describeEvent(const std::string& event, const Json::Value& data) {
     return displayValue(data);
 }
 
-void writeEvent(Session& session, const std::string& event, const std::string& text) {
+void writeEvent(Context& context, const std::string& event, const std::string& text) {
     std::string problem;
     const Json::Value data = parseJson(text, problem).value_or(Json::Value(text));
-    if (session.json) {
+    if (context.json) {
         Json::Value line;
         line["event"] = event;
         line["data"] = data;
-        session.console.out << compactJson(line) << '\n';
+        context.console.out << compactJson(line) << '\n';
     } else {
-        session.console.out << utcText(std::time(nullptr)) << "  " << printable(event) << "  "
+        context.console.out << utcText(std::time(nullptr)) << "  " << printable(event) << "  "
                             << printable(describeEvent(event, data)) << '\n';
     }
-    session.console.out.flush();
+    context.console.out.flush();
 }
 
-void followEvents(Session& session, const EventOptions& options) {
+void followEvents(Context& context, const EventOptions& options) {
     int seen = 0;
     const auto enough = [&] { return options.count > 0 && seen >= options.count; };
     const auto wanted = [&](const std::string& event) {
@@ -99,19 +99,19 @@ void followEvents(Session& session, const EventOptions& options) {
     };
     EventStream stream([&](const std::string& event, const std::string& data) {
         if (!enough() && wanted(event)) {
-            writeEvent(session, event, data);
+            writeEvent(context, event, data);
             ++seen;
         }
     });
-    session.console.watchInterruptions();
-    session.api.follow(
+    context.console.watchInterruptions();
+    context.api.follow(
         "/events",
         [&](std::string_view piece) {
             stream.feed(piece);
-            return !enough() && session.console.out.good();
+            return !enough() && context.console.out.good();
         },
-        session.console.interrupted);
-    if (!enough() && session.console.out.good() && !session.console.interrupted()) {
+        context.console.interrupted);
+    if (!enough() && context.console.out.good() && !context.console.interrupted()) {
         throw Failure(ExitCode::access, "The server ended the stream of events.",
                       "Check with 'veltctl status' that it runs, then follow the events again.");
     }
@@ -136,7 +136,7 @@ void addStatusCommands(CLI::App& app, Command& chosen) {
         ->allow_extra_args(false)
         ->type_name("KIND");
     events->callback(
-        [&chosen, options] { chosen = [options](Session& session) { followEvents(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { followEvents(context, *options); }; });
 }
 
 } // namespace velt::cli

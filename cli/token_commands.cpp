@@ -1,7 +1,7 @@
+#include "cli/command.h"
 #include "cli/failure.h"
-#include "cli/json_text.h"
-#include "cli/session.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -18,10 +18,10 @@ struct TokenOptions {
     std::string id;
 };
 
-void listTokens(Session& session) {
-    const Json::Value answer = session.api.get("/api/tokens");
-    if (session.json) {
-        writeJson(session.console.out, answer);
+void listTokens(Context& context) {
+    const Json::Value answer = context.api.get("/api/tokens");
+    if (context.json) {
+        writeJson(context.console.out, answer);
         return;
     }
     Table table({"ID", "NAME", "ROLE", "CREATED"});
@@ -29,34 +29,34 @@ void listTokens(Session& session) {
         table.add(
             {textAt(token, "id"), textAt(token, "name"), textAt(token, "role"), textAt(token, "created")});
     }
-    table.write(session.console.out);
+    table.write(context.console.out);
 }
 
-void createToken(Session& session, const TokenOptions& options) {
+void createToken(Context& context, const TokenOptions& options) {
     Json::Value body;
     body["name"] = options.name;
     body["role"] = options.role;
-    const Json::Value token = session.api.post("/api/tokens", body);
-    if (session.json) {
-        writeJson(session.console.out, token);
+    const Json::Value token = context.api.post("/api/tokens", body);
+    if (context.json) {
+        writeJson(context.console.out, token);
         return;
     }
     // The token alone goes to the output, so that it can be put into a file or a variable.
-    session.console.err << "Token " << printable(textAt(token, "id")) << " for "
+    context.console.err << "Token " << printable(textAt(token, "id")) << " for "
                         << printable(textAt(token, "name")) << " (" << printable(textAt(token, "role"))
                         << "). It is shown only now; keep it safe:\n";
-    session.console.out << printable(textAt(token, "token")) << '\n';
+    context.console.out << printable(textAt(token, "token")) << '\n';
 }
 
-void deleteToken(Session& session, const TokenOptions& options) {
-    session.api.remove("/api/tokens/" + percentEncode(options.id));
-    if (session.json) {
+void deleteToken(Context& context, const TokenOptions& options) {
+    context.api.remove("/api/tokens/" + percentEncode(options.id));
+    if (context.json) {
         Json::Value result;
         result["deleted"] = options.id;
-        writeJson(session.console.out, result);
+        writeJson(context.console.out, result);
         return;
     }
-    session.console.out << "Token " << printable(options.id) << " is no longer valid.\n";
+    context.console.out << "Token " << printable(options.id) << " is no longer valid.\n";
 }
 
 } // namespace
@@ -75,12 +75,12 @@ void addTokenCommands(CLI::App& app, Command& chosen) {
         ->check(CLI::IsMember({"admin", "viewer"}))
         ->type_name("admin|viewer");
     create->callback(
-        [&chosen, options] { chosen = [options](Session& session) { createToken(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { createToken(context, *options); }; });
 
     CLI::App* remove = tokens->add_subcommand("delete", "Make a token invalid");
     remove->add_option("id", options->id, "The id that 'tokens list' shows")->required()->type_name("");
     remove->callback(
-        [&chosen, options] { chosen = [options](Session& session) { deleteToken(session, *options); }; });
+        [&chosen, options] { chosen = [options](Context& context) { deleteToken(context, *options); }; });
 }
 
 } // namespace velt::cli

@@ -1,6 +1,6 @@
 #include "cli/http_client.h"
-#include "cli/json_text.h"
-#include "cli/table.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
 #include "cli/time_text.h"
 
 #include <gtest/gtest.h>

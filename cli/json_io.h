@@ -1,6 +1,6 @@
 // JSON values from text and to text.
-#ifndef VELT_CLI_JSON_TEXT_H
-#define VELT_CLI_JSON_TEXT_H
+#ifndef VELT_CLI_JSON_IO_H
+#define VELT_CLI_JSON_IO_H
 
 #include <json/value.h>
 

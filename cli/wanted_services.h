@@ -1,6 +1,6 @@
 // Whether services are switched on, as opposed to whether they run now.
-#ifndef VELT_CLI_STORED_SWITCHES_H
-#define VELT_CLI_STORED_SWITCHES_H
+#ifndef VELT_CLI_WANTED_SERVICES_H
+#define VELT_CLI_WANTED_SERVICES_H
 
 #include "cli/setting.h"
 

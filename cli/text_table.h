@@ -1,6 +1,6 @@
 // Tables for people.
-#ifndef VELT_CLI_TABLE_H
-#define VELT_CLI_TABLE_H
+#ifndef VELT_CLI_TEXT_TABLE_H
+#define VELT_CLI_TEXT_TABLE_H
 
 #include <iosfwd>
 #include <string>

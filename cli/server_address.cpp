@@ -1,4 +1,4 @@
-#include "cli/endpoint.h"
+#include "cli/server_address.h"
 
 #include "cli/failure.h"
 
@@ -33,7 +33,7 @@ void checkUrl(const std::string& url) {
     }
 }
 
-std::string readToken(const EndpointOptions& options, Console& console) {
+std::string readToken(const AddressOptions& options, Console& console) {
     if (options.tokenFile.empty()) {
         return console.environment("VELT_TOKEN").value_or("");
     }
@@ -45,44 +45,44 @@ std::string readToken(const EndpointOptions& options, Console& console) {
 }
 
 // A line end in the token would start a header of its own.
-void checkToken(const Endpoint& endpoint) {
-    const std::string& token = endpoint.token;
+void checkToken(const ServerAddress& server) {
+    const std::string& token = server.token;
     if (std::any_of(token.begin(), token.end(), [](unsigned char c) { return c <= 0x20 || c >= 0x7F; })) {
         throw Failure(ExitCode::usage, "The token holds characters that no token has.",
                       "Copy the token again; it is one word.");
     }
-    const bool encrypted = endpoint.url.rfind("https://", 0) == 0;
-    if (!token.empty() && endpoint.socket.empty() && !encrypted && !isLoopback(hostOf(endpoint.url))) {
-        throw Failure(ExitCode::usage, "The token would travel unencrypted to " + hostOf(endpoint.url) + ".",
+    const bool encrypted = server.url.rfind("https://", 0) == 0;
+    if (!token.empty() && server.socket.empty() && !encrypted && !isLoopback(hostOf(server.url))) {
+        throw Failure(ExitCode::usage, "The token would travel unencrypted to " + hostOf(server.url) + ".",
                       "Use an https:// address, or run veltctl on the server itself.");
     }
 }
 
 } // namespace
 
-Endpoint findEndpoint(const EndpointOptions& options, Console& console) {
-    Endpoint endpoint;
-    endpoint.url = options.url;
-    endpoint.socket = options.socket;
-    if (endpoint.url.empty() && endpoint.socket.empty()) {
-        endpoint.url = console.environment("VELT_URL").value_or("");
+ServerAddress findServer(const AddressOptions& options, Console& console) {
+    ServerAddress server;
+    server.url = options.url;
+    server.socket = options.socket;
+    if (server.url.empty() && server.socket.empty()) {
+        server.url = console.environment("VELT_URL").value_or("");
     }
-    if (endpoint.url.empty()) {
-        if (endpoint.socket.empty()) {
-            endpoint.socket = console.environment("VELT_SOCKET").value_or("");
+    if (server.url.empty()) {
+        if (server.socket.empty()) {
+            server.socket = console.environment("VELT_SOCKET").value_or("");
         }
-        if (endpoint.socket.empty()) {
-            endpoint.socket = defaultSocket;
+        if (server.socket.empty()) {
+            server.socket = defaultSocket;
         }
-        endpoint.url = "http://localhost";
+        server.url = "http://localhost";
     }
-    checkUrl(endpoint.url);
-    endpoint.url.erase(endpoint.url.find_last_not_of('/') + 1);
-    endpoint.token = readToken(options, console);
-    endpoint.caFile = options.caFile;
-    endpoint.timeoutSeconds = options.timeoutSeconds;
-    checkToken(endpoint);
-    return endpoint;
+    checkUrl(server.url);
+    server.url.erase(server.url.find_last_not_of('/') + 1);
+    server.token = readToken(options, console);
+    server.caFile = options.caFile;
+    server.timeoutSeconds = options.timeoutSeconds;
+    checkToken(server);
+    return server;
 }
 
 } // namespace velt::cli

@@ -1,6 +1,6 @@
-#include "cli/problem.h"
+#include "cli/server_refusal.h"
 
-#include "cli/json_text.h"
+#include "cli/json_io.h"
 
 namespace velt::cli {
 
@@ -50,18 +50,18 @@ std::string messageOf(long status) {
     return status >= 400 ? "The server refused the input" : "The answer is not that of a veltd";
 }
 
-std::string accessHint(long status, const Endpoint& endpoint) {
-    if (!endpoint.socket.empty()) {
+std::string accessHint(long status, const ServerAddress& server) {
+    if (!server.socket.empty()) {
         return "Run veltctl as root or as a member of the group velt-admin.";
     }
     if (status == 403) {
         return "Use a token of the role admin: this one may only read.";
     }
-    return endpoint.token.empty() ? "Give a token in VELT_TOKEN or with --token-file; 'veltctl tokens "
-                                    "create', run as root on the "
-                                    "server, makes one."
-                                  : "The token is not valid (any more): 'veltctl tokens create', run as root "
-                                    "on the server, makes one.";
+    return server.token.empty() ? "Give a token in VELT_TOKEN or with --token-file; 'veltctl tokens "
+                                  "create', run as root on the "
+                                  "server, makes one."
+                                : "The token is not valid (any more): 'veltctl tokens create', run as root "
+                                  "on the server, makes one.";
 }
 
 std::string conflictHint(const Json::Value& problem) {
@@ -73,11 +73,11 @@ std::string conflictHint(const Json::Value& problem) {
     return "Choose another port, or free this one. Nothing was changed.";
 }
 
-std::string hintOf(const HttpAnswer& answer, const Json::Value& problem, const Endpoint& endpoint) {
+std::string hintOf(const HttpAnswer& answer, const Json::Value& problem, const ServerAddress& server) {
     switch (answer.status) {
     case 401:
     case 403:
-        return accessHint(answer.status, endpoint);
+        return accessHint(answer.status, server);
     case 404:
     case 405:
         return "'veltctl call --list' shows the methods, 'veltctl tokens list' the tokens.";
@@ -113,7 +113,7 @@ void addFields(Failure& failure, const Json::Value& problem) {
 
 } // namespace
 
-Failure problemOf(const HttpAnswer& answer, const Endpoint& endpoint) {
+Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server) {
     std::string unreadable;
     Json::Value problem = parseJson(answer.body, unreadable).value_or(Json::Value());
     if (!problem.isObject()) {
@@ -125,7 +125,7 @@ Failure problemOf(const HttpAnswer& answer, const Endpoint& endpoint) {
         brackets += ", code " + code;
     }
     Failure failure(exitCodeOf(answer.status), messageOf(answer.status) + " (" + brackets + ").",
-                    hintOf(answer, problem, endpoint));
+                    hintOf(answer, problem, server));
     const std::string title = textAt(problem, "title");
     const std::string detail = textAt(problem, "detail");
     if (!title.empty() && title != detail) {

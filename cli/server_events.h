@@ -1,6 +1,6 @@
 // The server-sent events of a stream, put together from pieces of any size.
-#ifndef VELT_CLI_EVENT_STREAM_H
-#define VELT_CLI_EVENT_STREAM_H
+#ifndef VELT_CLI_SERVER_EVENTS_H
+#define VELT_CLI_SERVER_EVENTS_H
 
 #include <functional>
 #include <string>

@@ -1,4 +1,4 @@
-#include "cli/stored_switches.h"
+#include "cli/wanted_services.h"
 
 #include "cli/failure.h"
 

@@ -1,6 +1,6 @@
 // What every command works with: the server, the console and the form of the output.
-#ifndef VELT_CLI_SESSION_H
-#define VELT_CLI_SESSION_H
+#ifndef VELT_CLI_COMMAND_H
+#define VELT_CLI_COMMAND_H
 
 #include "cli/api_client.h"
 #include "cli/console.h"
@@ -13,14 +13,14 @@ class App;
 
 namespace velt::cli {
 
-struct Session {
+struct Context {
     Console& console;
     ApiClient& api;
     bool json = false; ///< the output is for programs
 };
 
 /// A command, ready to run. Throws Failure.
-using Command = std::function<void(Session&)>;
+using Command = std::function<void(Context&)>;
 
 // Each adds commands with their options to the parser. The command that the words name is put into `chosen`,
 // which outlives the parser.

@@ -1,4 +1,4 @@
-#include "cli/event_stream.h"
+#include "cli/server_events.h"
 
 namespace velt::cli {
 

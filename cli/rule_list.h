@@ -1,6 +1,6 @@
 // Chroot rules: who is confined to which directory over FTP.
-#ifndef VELT_CLI_CHROOT_RULES_H
-#define VELT_CLI_CHROOT_RULES_H
+#ifndef VELT_CLI_RULE_LIST_H
+#define VELT_CLI_RULE_LIST_H
 
 #include "cli/api_client.h"
 

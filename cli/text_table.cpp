@@ -1,4 +1,4 @@
-#include "cli/table.h"
+#include "cli/text_table.h"
 
 #include <algorithm>
 #include <cstddef>

@@ -1,7 +1,7 @@
-#include "cli/chroot_rules.h"
+#include "cli/rule_list.h"
 
 #include "cli/failure.h"
-#include "cli/json_text.h"
+#include "cli/json_io.h"
 
 #include <algorithm>
 

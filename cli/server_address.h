@@ -1,6 +1,6 @@
 // Where the server is, and with what right it is asked.
-#ifndef VELT_CLI_ENDPOINT_H
-#define VELT_CLI_ENDPOINT_H
+#ifndef VELT_CLI_SERVER_ADDRESS_H
+#define VELT_CLI_SERVER_ADDRESS_H
 
 #include "cli/console.h"
 
@@ -12,7 +12,7 @@ inline constexpr const char* defaultSocket = "/run/velt/veltd.sock";
 inline constexpr int defaultTimeoutSeconds = 60;
 
 /// What the command line says about the server. Empty texts: not given.
-struct EndpointOptions {
+struct AddressOptions {
     std::string url;
     std::string socket;
     std::string tokenFile;
@@ -20,7 +20,7 @@ struct EndpointOptions {
     int timeoutSeconds = defaultTimeoutSeconds;
 };
 
-struct Endpoint {
+struct ServerAddress {
     std::string url;    ///< scheme, host and port, without a slash at the end
     std::string socket; ///< path of a Unix socket; empty for TCP
     std::string token;  ///< bearer token; empty for none
@@ -34,7 +34,7 @@ struct Endpoint {
 /// The options first, then VELT_URL, VELT_SOCKET and VELT_TOKEN, then the default socket. Throws Failure
 /// (usage) for an address that is no http or https URL, and for a token that would travel unencrypted to
 /// another machine.
-Endpoint findEndpoint(const EndpointOptions& options, Console& console);
+ServerAddress findServer(const AddressOptions& options, Console& console);
 
 } // namespace velt::cli
 
