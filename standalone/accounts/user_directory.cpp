@@ -1,8 +1,8 @@
 #include "standalone/accounts/user_directory.h"
 
+#include "base/file_stamp.h"
 #include "standalone/accounts/account_snapshot.h"
 #include "standalone/accounts/account_sources.h"
-#include "standalone/accounts/file_stamp.h"
 #include "standalone/accounts/name_service.h"
 #include "standalone/core/file_store.h"
 

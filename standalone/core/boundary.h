@@ -11,11 +11,22 @@
 
 namespace velt {
 
-/// Calls `operation` and returns its int. An exception does not leave it: the result is then -1, with the
-/// last error set. The body of a contract function that can throw, allocation included, stands in it.
+inline int toContract(int result) {
+    return result;
+}
+inline int toContract(const Result<>& result) {
+    return result ? 0 : fail(result.error());
+}
+inline int toContract(const Result<int>& result) {
+    return result ? *result : fail(result.error());
+}
+
+/// Calls `operation` and returns its int, or that of its Result: 0 or the value, -1 with the last error set.
+/// An exception does not leave it: the result is then -1, with the last error set. The body of a contract
+/// function that can throw, allocation included, stands in it.
 template<class Operation> int atBoundary(Operation&& operation) noexcept {
     try {
-        return std::forward<Operation>(operation)();
+        return toContract(std::forward<Operation>(operation)());
     } catch (const std::bad_alloc&) {
         // An empty sentence needs no memory.
         return fail(ErrorNumber::outOfMemory, std::string());

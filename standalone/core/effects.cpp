@@ -2,6 +2,7 @@
 
 #include "standalone/core/last_error.h"
 
+#include <optional>
 #include <utility>
 
 namespace velt {
@@ -89,6 +90,17 @@ int perform(Effect effect, std::string_view subject, const std::function<int()>&
         fail(errorOf(effect), "The effect \"" + std::string(effectName(effect)) + "\" on " +
                                   std::string(subject) + " was refused.");
     return decision.result;
+}
+
+Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act) {
+    std::optional<Result<>> outcome;
+    const int result = perform(effect, subject, std::function<int()>([&] {
+                                   outcome = act();
+                                   return *outcome ? 0 : -1;
+                               }));
+    if (outcome)
+        return *outcome;
+    return result < 0 ? Result<>(lastErrorAsValue()) : Result<>();
 }
 
 void setEffectHook(EffectHook hook) {

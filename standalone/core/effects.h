@@ -3,6 +3,8 @@
 #ifndef VELT_STANDALONE_CORE_EFFECTS_H
 #define VELT_STANDALONE_CORE_EFFECTS_H
 
+#include "base/result.h"
+
 #include <chrono>
 #include <functional>
 #include <string>
@@ -27,6 +29,7 @@ std::string_view effectName(Effect effect);
 /// what it concerns ("ftp settings", "ftpd", "velt.service.action"). The hook of the calling thread, when
 /// there is one, is asked first, and its report, when there is one, is told after.
 int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
+Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act);
 
 /// What a hook decides about one effect: do it, or leave it undone with this result.
 struct EffectDecision {

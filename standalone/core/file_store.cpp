@@ -1,7 +1,7 @@
 #include "standalone/core/file_store.h"
 
+#include "base/unique_fd.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/unique_fd.h"
 
 #include <fcntl.h>
 #include <sys/file.h>

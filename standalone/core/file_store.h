@@ -1,4 +1,4 @@
-// Files that are whole at every moment, and the lock for changing them.
+// Files that are whole at every moment.
 #ifndef VELT_STANDALONE_CORE_FILE_STORE_H
 #define VELT_STANDALONE_CORE_FILE_STORE_H
 
@@ -21,22 +21,6 @@ std::optional<std::string> readFile(const std::filesystem::path& path);
 
 /// Whether the path leads to the opened file, and not to a link or to a file that took its place.
 bool isSameFile(int descriptor, const std::filesystem::path& path);
-
-/// Holds the lock of the state root, across threads and processes, while it lives. Read-modify-write
-/// of a stored file happens under it. A thread that holds it may take it again.
-class StateLock {
-public:
-    StateLock();
-    ~StateLock();
-    StateLock(const StateLock&) = delete;
-    StateLock& operator=(const StateLock&) = delete;
-
-    /// False when the lock cannot be had (the last error says why).
-    explicit operator bool() const { return held_; }
-
-private:
-    bool held_ = false;
-};
 
 } // namespace velt
 

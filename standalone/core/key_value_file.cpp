@@ -1,10 +1,7 @@
 #include "standalone/core/key_value_file.h"
 
-#include "platform/core.h"
-#include "standalone/core/boundary.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/state_root.h"
 
 #include <sys/stat.h>
 
@@ -127,19 +124,3 @@ int writeKeyValue(const std::filesystem::path& file, std::string_view key, std::
 }
 
 } // namespace velt
-
-int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int size, int /*flags*/) {
-    if (path == nullptr || key == nullptr || value == nullptr || size < 1)
-        return velt::fail(velt::ErrorNumber::invalid, "There is no file, no key or no room for its value.");
-    return velt::atBoundary([&] {
-        std::string text;
-        const int result = velt::readKeyValue(velt::statePath(path), key, text);
-        if (result > 0) {
-            // A NUL byte in the file ends the value for every reader of C strings; so it does here.
-            const auto length = std::min({text.size(), text.find('\0'), static_cast<std::size_t>(size - 1)});
-            std::memcpy(value, text.data(), length);
-            value[length] = '\0';
-        }
-        return result;
-    });
-}

@@ -1,7 +1,5 @@
 #include "standalone/core/last_error.h"
 
-#include "platform/core.h"
-
 #include <string_view>
 #include <utility>
 
@@ -39,6 +37,23 @@ int fail(ErrorNumber number, std::string sentence, SourcePlace where) {
     return -1;
 }
 
+int fail(const Error& error) {
+    return fail(error.number == ErrorNumber::none ? ErrorNumber::store : error.number, error.message,
+                error.where);
+}
+
+Error lastErrorAsValue() {
+    return {lastError().number, lastError().sentence, lastErrorPlace()};
+}
+
+ErrorNumber lastErrorNumber() {
+    return lastError().number;
+}
+
+SourcePlace lastErrorPlace() {
+    return {lastError().file, lastError().line};
+}
+
 const std::string& lastErrorSentence() {
     return lastError().sentence;
 }
@@ -58,15 +73,3 @@ LastErrorKept::~LastErrorKept() {
 }
 
 } // namespace velt
-
-int VLIBCErrGet(void) {
-    return static_cast<int>(velt::lastError().number);
-}
-
-const char* VLIBCErrorGetFile(void) {
-    return velt::lastError().file;
-}
-
-int VLIBCErrorGetLine(void) {
-    return velt::lastError().line;
-}

@@ -1,8 +1,9 @@
+#include "standalone/core/state_lock.h"
+
+#include "base/unique_fd.h"
 #include "standalone/core/file_lock.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/core/unique_fd.h"
 
 #include <fcntl.h>
 

@@ -1,16 +1,15 @@
-#include "platform/firewall.h"
+#include "standalone/firewall/firewall.h"
 
-#include "standalone/core/boundary.h"
-#include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/process.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/ruleset.h"
 #include "standalone/firewall/ruleset_generation.h"
+#include "standalone/process/run_program.h"
 #include "standalone/settings/settings.h"
 
 #include <syslog.h>
@@ -101,7 +100,9 @@ int replaceRules(const std::string& script) {
     return 0;
 }
 
-int loadRules() {
+} // namespace
+
+int loadFirewallRules() {
     if (!mayTouchRules()) {
         return 0;
     }
@@ -125,10 +126,4 @@ int loadRules() {
     return off ? removeRules(script) : replaceRules(script);
 }
 
-} // namespace
 } // namespace velt
-
-int VELTFwRuleHup(void) {
-    return velt::atBoundary(
-        [] { return velt::perform(velt::Effect::firewall, "firewall rules", velt::loadRules); });
-}

@@ -4,7 +4,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
-#include "standalone/supervise/process_identity.h"
+#include "standalone/process/process_identity.h"
 
 #include <sys/stat.h>
 #include <syslog.h>

@@ -1,7 +1,7 @@
 #include "standalone/firewall/ruleset_generation.h"
 
-#include "standalone/core/input_wait.h"
-#include "standalone/core/unique_fd.h"
+#include "base/input_wait.h"
+#include "base/unique_fd.h"
 
 #include <arpa/inet.h>
 #include <linux/netfilter/nf_tables.h>

@@ -1,8 +1,8 @@
 #include "standalone/ports/port_probe.h"
 
+#include "base/unique_fd.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/unique_fd.h"
-#include "standalone/ports/listening_sockets.h"
+#include "standalone/process/listening_sockets.h"
 
 #include <netinet/in.h>
 #include <sys/socket.h>

@@ -4,8 +4,8 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "standalone/settings/candidate.h"
 #include "standalone/settings/settings_files.h"
 
 #include <unistd.h>
@@ -38,25 +38,6 @@ std::optional<Settings> loadFile(std::string_view name, Parse<Settings> parse, c
 int storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
     return perform(Effect::store, subject,
                    [&] { return replaceFile(statePath(name), contents, settingsMode); });
-}
-
-int storeFtpFile(const FtpSettings& settings) {
-    return storeFile("ftp settings", ftpSettingsFile, formatFtpSettings(settings));
-}
-
-int storeSftpFile(const SftpSettings& settings) {
-    return storeFile("sftp settings", sftpSettingsFile, formatSftpSettings(settings));
-}
-
-// The daemon's test needs what the daemon needs: its program, its account, shares that can be read. Settings
-// that switch a service off, or are changed while it is off, must not fail for the want of these; switching
-// it on tests them all.
-int testIfOn(const FtpSettings& settings) {
-    return enablesFtp(settings.record) ? testFtpCandidate(settings) : 0;
-}
-
-int testIfOn(const SftpSettings& settings) {
-    return settings.enabled ? testSftpCandidate(settings) : 0;
 }
 
 bool isMissing(std::string_view name) {
@@ -94,54 +75,21 @@ std::optional<SftpSettings> loadSftpSettings() {
     return loadFile<SftpSettings>(sftpSettingsFile, parseSftpSettings, SftpSettings());
 }
 
-int changeFtpSettings(const std::function<void(FtpSettings&)>& change) {
-    const StateLock lock;
-    if (!lock)
-        return -1;
-    auto settings = loadFtpSettings();
-    if (!settings)
-        return -1;
-    change(*settings);
-    if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
-        return -1;
-    return storeFtpFile(*settings);
+int storeFtpSettings(const FtpSettings& settings) {
+    return storeFile("ftp settings", ftpSettingsFile, formatFtpSettings(settings));
 }
 
-int changeSftpSettings(const std::function<void(SftpSettings&)>& change) {
-    const StateLock lock;
-    if (!lock)
-        return -1;
-    auto settings = loadSftpSettings();
-    if (!settings)
-        return -1;
-    change(*settings);
-    if (checkSftpSettings(*settings) < 0 || testIfOn(*settings) < 0)
-        return -1;
-    return storeSftpFile(*settings);
-}
-
-int changeExternalAddress(const std::string& address) {
-    const StateLock lock;
-    if (!lock)
-        return -1;
-    auto settings = loadFtpFile();
-    if (!settings)
-        return -1;
-    settings->externalAddress = address;
-    if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
-        return -1;
-    return perform(Effect::store, "external address", [&] {
-        return writeKeyValue(statePath(systemInformationFile), externalAddressKey, address);
-    });
+int storeSftpSettings(const SftpSettings& settings) {
+    return storeFile("sftp settings", sftpSettingsFile, formatSftpSettings(settings));
 }
 
 int writeMissingSettings() {
     const StateLock lock;
     if (!lock)
         return -1;
-    if (isMissing(ftpSettingsFile) && storeFtpFile(defaultFtpSettings()) < 0)
+    if (isMissing(ftpSettingsFile) && storeFtpSettings(defaultFtpSettings()) < 0)
         return -1;
-    return isMissing(sftpSettingsFile) ? storeSftpFile(SftpSettings()) : 0;
+    return isMissing(sftpSettingsFile) ? storeSftpSettings(SftpSettings()) : 0;
 }
 
 } // namespace velt

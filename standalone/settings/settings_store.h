@@ -1,10 +1,9 @@
-// Changing the stored settings.
+// The files of the stored settings.
 #ifndef VELT_STANDALONE_SETTINGS_SETTINGS_STORE_H
 #define VELT_STANDALONE_SETTINGS_SETTINGS_STORE_H
 
 #include "standalone/settings/settings.h"
 
-#include <functional>
 #include <optional>
 
 namespace velt {
@@ -13,14 +12,10 @@ namespace velt {
 /// as loadFtpSettings.
 std::optional<FtpSettings> loadFtpFile();
 
-/// Reads the settings, lets `change` change them, and stores them after the checks here and the daemon's own
-/// test have passed, all under the StateLock. Settings of a service that is off are not put to the daemon: it
-/// may be what is broken. Negative on failure, with the last error set; nothing is stored then.
-int changeFtpSettings(const std::function<void(FtpSettings&)>& change);
-int changeSftpSettings(const std::function<void(SftpSettings&)>& change);
-
-/// Stores the external address in the same manner.
-int changeExternalAddress(const std::string& address);
+/// Writes the settings down as they are: no check, no daemon asked. To be called under the StateLock.
+/// Negative on failure, with the last error set.
+int storeFtpSettings(const FtpSettings& settings);
+int storeSftpSettings(const SftpSettings& settings);
 
 } // namespace velt
 

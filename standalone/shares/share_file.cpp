@@ -1,6 +1,6 @@
 #include "standalone/shares/share_file.h"
 
-#include "standalone/text/plain_text.h"
+#include "base/plain_text.h"
 
 #include <json/json.h>
 

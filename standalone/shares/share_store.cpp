@@ -1,9 +1,10 @@
 #include "standalone/shares/share_store.h"
 
-#include "standalone/accounts/file_stamp.h"
+#include "base/file_stamp.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_file.h"
 

@@ -1,6 +1,6 @@
 #include "standalone/supervise/control_channel.h"
 
-#include "standalone/core/input_wait.h"
+#include "base/input_wait.h"
 
 #include <fcntl.h>
 #include <sys/socket.h>

@@ -1,8 +1,8 @@
 #include "standalone/supervise/daemon_process.h"
 
-#include "standalone/core/spawn_setup.h"
-#include "standalone/ports/listening_sockets.h"
-#include "standalone/supervise/last_words.h"
+#include "base/spawn_setup.h"
+#include "standalone/process/last_words.h"
+#include "standalone/process/listening_sockets.h"
 
 #include <fcntl.h>
 #include <poll.h>

@@ -2,7 +2,7 @@
 #ifndef VELT_STANDALONE_SUPERVISE_DAEMON_PROCESS_H
 #define VELT_STANDALONE_SUPERVISE_DAEMON_PROCESS_H
 
-#include "standalone/supervise/process_identity.h"
+#include "standalone/process/process_identity.h"
 
 #include <chrono>
 #include <deque>

@@ -1,6 +1,6 @@
 #include "standalone/supervise/service_state.h"
 
-#include "standalone/ports/listening_sockets.h"
+#include "standalone/process/listening_sockets.h"
 
 #include <algorithm>
 #include <array>

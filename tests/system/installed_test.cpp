@@ -1,5 +1,5 @@
 // An installation at work: its parts find each other without being told where they are.
-#include "standalone/core/process.h"
+#include "standalone/process/run_program.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/leftovers.h"
 #include "tests/system/support/private_world.h"

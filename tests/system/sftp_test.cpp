@@ -1,9 +1,9 @@
 // The SFTP service with real clients.
 #include "platform/sftp.h"
-#include "standalone/chroot/rule_store.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/process.h"
 #include "standalone/core/state_root.h"
+#include "standalone/process/run_program.h"
+#include "standalone/rules/rule_store.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/ftp_service.h"
 #include "tests/system/support/private_world.h"

@@ -2,8 +2,8 @@
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
+#include "standalone/control/systemd_unit.h"
 #include "standalone/core/last_error.h"
-#include "standalone/services/systemd_unit.h"
 #include "standalone/standalone.h"
 #include "tests/system/support/systemd_services.h"
 

@@ -1,5 +1,5 @@
 // The quick start and the README's tour, as somebody does them who reads the page and copies its commands.
-#include "standalone/core/process.h"
+#include "standalone/process/run_program.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/leftovers.h"
 #include "tests/system/support/private_world.h"

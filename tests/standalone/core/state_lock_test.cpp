@@ -1,7 +1,8 @@
+#include "base/unique_fd.h"
 #include "standalone/core/file_lock.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/unique_fd.h"
+#include "standalone/core/state_lock.h"
 #include "tests/standalone/support/state_folder.h"
 
 #include <gtest/gtest.h>

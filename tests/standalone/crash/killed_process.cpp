@@ -1,6 +1,6 @@
 #include "tests/standalone/crash/killed_process.h"
 
-#include "standalone/core/unique_fd.h"
+#include "base/unique_fd.h"
 
 #include <gtest/gtest.h>
 

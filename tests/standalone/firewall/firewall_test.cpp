@@ -7,11 +7,12 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/process.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
+#include "standalone/process/run_program.h"
+#include "tests/standalone/control/plan_double.h"
 #include "tests/standalone/firewall/private_network.h"
-#include "tests/standalone/services/plan_double.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
 #include <gtest/gtest.h>

@@ -1,7 +1,7 @@
 #include "tests/standalone/settings/fake_candidate.h"
 
 #include "standalone/core/last_error.h"
-#include "standalone/settings/candidate.h"
+#include "standalone/daemons/candidate.h"
 
 namespace velt {
 

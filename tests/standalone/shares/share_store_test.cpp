@@ -2,8 +2,8 @@
 
 #include "platform/core.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/support/temporary_folder.h"
 

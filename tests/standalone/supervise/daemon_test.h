@@ -2,8 +2,8 @@
 #ifndef VELT_TESTS_STANDALONE_SUPERVISE_DAEMON_TEST_H
 #define VELT_TESTS_STANDALONE_SUPERVISE_DAEMON_TEST_H
 
-#include "standalone/daemon_plan.h"
-#include "standalone/supervise/process_identity.h"
+#include "standalone/daemons/daemon_plan.h"
+#include "standalone/process/process_identity.h"
 
 #include <gtest/gtest.h>
 

@@ -2,8 +2,8 @@
 // manager.
 
 #include "standalone/core/file_store.h"
+#include "standalone/core/installed_files.h"
 #include "standalone/core/state_root.h"
-#include "standalone/installed_files.h"
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/service_state.h"
 #include "tests/standalone/supervise/daemon_test.h"

@@ -1,9 +1,9 @@
 // velt-supervise with a real daemon, driven as the services drive it.
 
+#include "standalone/control/supervise_backend.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/ports/listening_sockets.h"
-#include "standalone/services/supervise_backend.h"
+#include "standalone/process/listening_sockets.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
 #include <sys/wait.h>

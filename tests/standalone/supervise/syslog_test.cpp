@@ -1,7 +1,7 @@
 // Under which names the daemons' words are found in the system's log.
+#include "base/unique_fd.h"
+#include "standalone/control/supervise_backend.h"
 #include "standalone/core/last_error.h"
-#include "standalone/core/unique_fd.h"
-#include "standalone/services/supervise_backend.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
 #include <fcntl.h>

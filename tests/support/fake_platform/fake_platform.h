@@ -6,8 +6,8 @@
 //
 // Tests of a program that loads the module at run time must link the whole archive and export its
 // symbols. Threads: one.
-#ifndef VELT_TESTS_SUPPORT_FAKE_PLATFORM_H
-#define VELT_TESTS_SUPPORT_FAKE_PLATFORM_H
+#ifndef VELT_TESTS_SUPPORT_FAKE_PLATFORM_FAKE_PLATFORM_H
+#define VELT_TESTS_SUPPORT_FAKE_PLATFORM_FAKE_PLATFORM_H
 
 #include "ftp/ftp_library.h"
 #include "platform/sftp.h"

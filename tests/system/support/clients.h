@@ -4,8 +4,8 @@
 #ifndef VELT_TESTS_SYSTEM_SUPPORT_CLIENTS_H
 #define VELT_TESTS_SYSTEM_SUPPORT_CLIENTS_H
 
-#include "standalone/core/process.h"
-#include "standalone/core/unique_fd.h"
+#include "base/unique_fd.h"
+#include "standalone/process/run_program.h"
 #include "tests/system/support/ftp_session.h"
 
 #include <string>

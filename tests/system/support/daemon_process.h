@@ -2,7 +2,7 @@
 #ifndef VELT_TESTS_SYSTEM_SUPPORT_DAEMON_PROCESS_H
 #define VELT_TESTS_SYSTEM_SUPPORT_DAEMON_PROCESS_H
 
-#include "standalone/daemon_plan.h"
+#include "standalone/daemons/daemon_plan.h"
 
 #include <sys/types.h>
 

@@ -2,7 +2,7 @@
 #ifndef VELT_TESTS_SYSTEM_SUPPORT_RUNNING_PROGRAM_H
 #define VELT_TESTS_SYSTEM_SUPPORT_RUNNING_PROGRAM_H
 
-#include "standalone/core/unique_fd.h"
+#include "base/unique_fd.h"
 
 #include <sys/types.h>
 

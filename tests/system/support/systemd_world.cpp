@@ -1,7 +1,7 @@
 #include "tests/system/support/systemd_world.h"
 
-#include "standalone/core/process.h"
-#include "standalone/core/unique_fd.h"
+#include "base/unique_fd.h"
+#include "standalone/process/run_program.h"
 #include "tests/system/support/systemd_root.h"
 
 #include <fcntl.h>

@@ -1,0 +1,75 @@
+// What an operation gives: its value, or the reason why there is none.
+#ifndef VELT_BASE_RESULT_H
+#define VELT_BASE_RESULT_H
+
+#include <string>
+#include <utility>
+#include <variant>
+
+namespace velt {
+
+/// The kind of an error. Each program names its own; 0 is an error whose message says all there is to know.
+enum class ErrorNumber : int;
+
+/// A place in the source. (std::source_location is not there with every compiler that builds this.)
+struct SourcePlace {
+    const char* file = "";
+    int line = 0;
+
+    /// The place of the call; as a default argument, that of the caller's call.
+    static constexpr SourcePlace current(const char* file = __builtin_FILE(), int line = __builtin_LINE()) {
+        return {file, line};
+    }
+};
+
+/// Why an operation failed.
+struct Error {
+    ErrorNumber number{};
+    std::string message; ///< a sentence that says what failed and why
+    SourcePlace where;   ///< where it was noticed
+
+    Error(ErrorNumber kind, std::string sentence, SourcePlace place = SourcePlace::current())
+        : number(kind), message(std::move(sentence)), where(place) {}
+    explicit Error(std::string sentence, SourcePlace place = SourcePlace::current())
+        : Error(ErrorNumber{}, std::move(sentence), place) {}
+};
+
+/// A value, or the Error that kept it from being made. What can fail and gives nothing returns a Result<>. A
+/// value that is not there may not be asked for, nor an error.
+///
+///     Result<std::string> text = readFile(path);
+///     if (!text)
+///         return text.error();
+template<class Value = void> class [[nodiscard]] Result {
+public:
+    Result(Value value) : outcome_(std::move(value)) {}
+    Result(Error error) : outcome_(std::move(error)) {}
+
+    explicit operator bool() const { return std::holds_alternative<Value>(outcome_); }
+    Value& operator*() { return std::get<Value>(outcome_); }
+    const Value& operator*() const { return std::get<Value>(outcome_); }
+    Value* operator->() { return &std::get<Value>(outcome_); }
+    const Value* operator->() const { return &std::get<Value>(outcome_); }
+    Error& error() { return std::get<Error>(outcome_); }
+    const Error& error() const { return std::get<Error>(outcome_); }
+
+private:
+    std::variant<Value, Error> outcome_;
+};
+
+template<> class [[nodiscard]] Result<void> {
+public:
+    Result() = default;
+    Result(Error error) : outcome_(std::move(error)) {}
+
+    explicit operator bool() const { return std::holds_alternative<std::monostate>(outcome_); }
+    Error& error() { return std::get<Error>(outcome_); }
+    const Error& error() const { return std::get<Error>(outcome_); }
+
+private:
+    std::variant<std::monostate, Error> outcome_;
+};
+
+} // namespace velt
+
+#endif

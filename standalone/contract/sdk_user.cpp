@@ -1,0 +1,39 @@
+#include "platform/sdk_user.h"
+
+#include "base/plain_text.h"
+#include "standalone/accounts/user_directory.h"
+#include "standalone/core/last_error.h"
+
+#include <memory>
+#include <new>
+
+namespace {
+
+// What stands behind the handle. The public class has no fields.
+struct LoadedUser : SDK::User {
+    explicit LoadedUser(std::string text) : description(std::move(text)) {}
+    std::string description;
+};
+
+} // namespace
+
+namespace SDK {
+
+User* User::LoadUser(const std::string& name) {
+    std::optional<velt::UserEntry> user = velt::userByName(name);
+    if (!user) {
+        velt::fail(velt::ErrorNumber::notFound, "There is no user \"" + velt::plainText(name, 120) + "\".");
+        return nullptr;
+    }
+    return std::make_unique<LoadedUser>(std::move(user->description)).release();
+}
+
+void User::Release(User* user) {
+    const std::unique_ptr<LoadedUser> owner(static_cast<LoadedUser*>(user));
+}
+
+std::string User::GetDesc() const {
+    return static_cast<const LoadedUser*>(this)->description;
+}
+
+} // namespace SDK

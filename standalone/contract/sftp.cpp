@@ -1,0 +1,50 @@
+// The contract's operations on the SFTP settings.
+#include "platform/sftp.h"
+#include "standalone/control/change_settings.h"
+#include "standalone/core/boundary.h"
+#include "standalone/core/last_error.h"
+#include "standalone/settings/record_merge.h"
+
+namespace velt {
+
+namespace {
+
+LastSeen<SftpSettings>& lastSeenSettings() {
+    thread_local LastSeen<SftpSettings> seen;
+    return seen;
+}
+
+int readRecord(_tag_VELT_SFTP_CONFIG_& record) {
+    lastSeenSettings().forget();
+    const auto settings = loadSftpSettings();
+    if (!settings)
+        return -1;
+    record = _tag_VELT_SFTP_CONFIG_{};
+    record.enable = settings->enabled ? 1 : 0;
+    record.port = settings->port;
+    lastSeenSettings().note(*settings);
+    return 0;
+}
+
+int storeSettings(const SftpSettings& wanted) {
+    const int result = changeSftpSettings(
+        [&wanted](SftpSettings& settings) { settings = lastSeenSettings().merge(settings, wanted); });
+    // Not what was stored in the end: the caller goes on with its own copy.
+    if (result >= 0)
+        lastSeenSettings().note(wanted);
+    return result;
+}
+
+} // namespace
+
+} // namespace velt
+
+int VELTSFTPConfigGet(int which, _tag_VELT_SFTP_CONFIG_* out) {
+    if (which != 1 || out == nullptr)
+        return velt::fail(velt::ErrorNumber::invalid, "There is no such SFTP record, or no place for it.");
+    return velt::atBoundary([out] { return velt::readRecord(*out); });
+}
+
+int VELTSFTPConfigSet(int enable, int port) {
+    return velt::atBoundary([=] { return velt::storeSettings({enable != 0, port}); });
+}

@@ -1,0 +1,26 @@
+// Supervisors that detach themselves from the process which starts them.
+#ifndef VELT_STANDALONE_CONTROL_CHILD_LAUNCHER_H
+#define VELT_STANDALONE_CONTROL_CHILD_LAUNCHER_H
+
+#include "standalone/control/supervisor_launcher.h"
+
+#include <string>
+
+namespace velt {
+
+/// A supervisor that is killed stays away: the next start finds what it left and begins anew.
+class ChildLauncher : public SupervisorLauncher {
+public:
+    explicit ChildLauncher(std::string daemon);
+
+    std::string launch(const std::filesystem::path& directory, const DaemonPlan& plan) override;
+    std::string keep(const std::filesystem::path&, const DaemonPlan&) override { return {}; }
+    std::string retire() override { return {}; }
+
+private:
+    std::string daemon_;
+};
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,17 @@
+// Taking a state root into use.
+#ifndef VELT_STANDALONE_CONTROL_OPEN_STATE_H
+#define VELT_STANDALONE_CONTROL_OPEN_STATE_H
+
+#include <filesystem>
+
+namespace velt {
+
+/// Chooses the root folder of all stored state ("/" in production), and writes the default settings where
+/// there are none yet: both services off. Settings that are there already stay, also when they are damaged;
+/// whoever reads those is told. To be called once, before any other operation of the library and while the
+/// process has one thread only.
+int openState(const std::filesystem::path& root);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,34 @@
+#include "standalone/control/start_failure.h"
+
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+
+#include <filesystem>
+#include <system_error>
+
+namespace velt {
+namespace {
+
+std::filesystem::path noteFile(const std::string& daemon) {
+    return statePath("/run/velt") / (daemon + ".failure");
+}
+
+} // namespace
+
+int noteOutcome(const std::string& daemon, int result) {
+    if (result >= 0) {
+        std::error_code ignored;
+        std::filesystem::remove(noteFile(daemon), ignored);
+        return result;
+    }
+    const LastErrorKept kept;
+    replaceFile(noteFile(daemon), lastErrorSentence(), 0644);
+    return result;
+}
+
+std::optional<std::string> startFailure(const std::string& daemon) {
+    return readFile(noteFile(daemon));
+}
+
+} // namespace velt

@@ -1,0 +1,49 @@
+#include "standalone/core/trusted_file.h"
+
+#include "base/unique_fd.h"
+#include "standalone/core/last_error.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <cerrno>
+#include <cstring>
+
+namespace velt {
+namespace {
+
+constexpr off_t longestFile = off_t{16} << 20;
+
+std::optional<std::string> refuse(const std::filesystem::path& path, const std::string& why) {
+    fail(ErrorNumber::store, "The file " + path.string() + " " + why + ".");
+    return std::nullopt;
+}
+
+} // namespace
+
+std::optional<std::string> readTrusted(const std::filesystem::path& path) {
+    const UniqueFd file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+    struct stat facts {};
+    if (!file || fstat(file.get(), &facts) < 0) {
+        return refuse(path, std::string("cannot be opened: ") + std::strerror(errno));
+    }
+    if (!S_ISREG(facts.st_mode) || facts.st_size > longestFile) {
+        return refuse(path, "is no file of at most 16 MiB");
+    }
+    if ((facts.st_uid != 0 && facts.st_uid != getuid()) || (facts.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
+        return refuse(path, "belongs to another account, or others may write it");
+    }
+    std::string text;
+    std::array<char, 65536> part{};
+    ssize_t got = 0;
+    while ((got = read(file.get(), part.data(), part.size())) > 0) {
+        text.append(part.data(), static_cast<std::size_t>(got));
+    }
+    if (got < 0 || static_cast<off_t>(text.size()) != facts.st_size) {
+        return refuse(path, "cannot be read as a whole");
+    }
+    return text;
+}
+
+} // namespace velt

@@ -1,0 +1,18 @@
+// The files that decide what a login may see.
+#ifndef VELT_STANDALONE_CORE_TRUSTED_FILE_H
+#define VELT_STANDALONE_CORE_TRUSTED_FILE_H
+
+#include <filesystem>
+#include <optional>
+#include <string>
+
+namespace velt {
+
+/// The whole file. It must be a regular file of at most 16 MiB that belongs to root, or to whom this process
+/// belongs, and that nobody else may write. Nothing, with the last error set, when it is not, is missing, or
+/// cannot be read.
+std::optional<std::string> readTrusted(const std::filesystem::path& path);
+
+} // namespace velt
+
+#endif

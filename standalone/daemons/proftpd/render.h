@@ -1,0 +1,48 @@
+// The text of the FTP daemon's configuration.
+#ifndef VELT_STANDALONE_DAEMONS_PROFTPD_RENDER_H
+#define VELT_STANDALONE_DAEMONS_PROFTPD_RENDER_H
+
+#include "standalone/settings/settings.h"
+
+#include <filesystem>
+#include <optional>
+#include <string>
+
+namespace velt {
+
+/// Accounts from files of their own in place of the server's users: for a daemon without root's rights.
+struct AccountFiles {
+    std::filesystem::path users;
+    std::filesystem::path groups;
+};
+
+/// What the configuration needs to know beside the settings. All of it is made by the platform; none of it is
+/// text that reached the platform through a request.
+struct ProftpdPlaces {
+    std::filesystem::path moduleFolder; ///< holds mod_velt_chroot.so
+    std::filesystem::path runFolder;    ///< for the daemon's own run-time files
+    std::filesystem::path loginProgram; ///< velt-share-root
+    std::filesystem::path stateRoot;
+    std::filesystem::path loginRoot; ///< an empty folder, on which the program shows what a login may see
+    std::filesystem::path anonymousShare; ///< a file: names the share that anonymous users are confined to
+    std::filesystem::path certificate;    ///< needed where FTPS is on
+    std::filesystem::path certificateKey;
+    bool certificateIsRsa = false; ///< else it is an elliptic curve's
+    std::string user = "proftpd";
+    std::string group = "nogroup";
+    bool ipv6 = true;
+    bool loopbackOnly = false;                ///< clients of this machine only, over IPv4
+    std::optional<AccountFiles> accountFiles; ///< absent: the server's users, through PAM
+};
+
+/// Whether the path can stand in the configuration: absolute, of at most 1024 bytes, and without the
+/// characters that mean something to the daemon even between quotes.
+bool isRenderable(const std::filesystem::path& path);
+
+/// The whole configuration. The settings have passed checkFtpSettings, the places isRenderable. A pure
+/// function.
+std::string renderProftpd(const FtpSettings& settings, const ProftpdPlaces& places);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,25 @@
+// The text of the SFTP daemon's configuration.
+#ifndef VELT_STANDALONE_DAEMONS_SSHD_RENDER_H
+#define VELT_STANDALONE_DAEMONS_SSHD_RENDER_H
+
+#include "standalone/settings/settings.h"
+
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace velt {
+
+struct SshdPlaces {
+    std::vector<std::filesystem::path> hostKeys; ///< absolute, without quotes, control characters and '%'
+    bool privileged = true;    ///< else the daemon serves its own user alone, with keys and without passwords
+    bool loopbackOnly = false; ///< clients of this machine only, over IPv4
+};
+
+/// The whole configuration: file transfer and nothing else. The settings have passed checkSftpSettings. A
+/// pure function.
+std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places);
+
+} // namespace velt
+
+#endif

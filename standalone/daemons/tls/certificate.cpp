@@ -1,0 +1,142 @@
+#include "standalone/daemons/tls/certificate.h"
+
+#include "base/sha256.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_lock.h"
+#include "standalone/core/state_root.h"
+#include "standalone/daemons/configuration_test.h"
+#include "standalone/daemons/tls/openssl_owners.h"
+#include "standalone/daemons/tls/self_signed.h"
+
+#include <openssl/err.h>
+#include <openssl/pem.h>
+
+namespace velt {
+namespace {
+
+struct Pair {
+    std::filesystem::path certificate;
+    std::filesystem::path key;
+};
+
+// A key that asks for a passphrase is one that a daemon cannot load; nobody sits there to be asked.
+int noPassphrase(char*, int, int, void*) {
+    return -1;
+}
+
+BioOwner reader(const std::string& text) {
+    return BioOwner(BIO_new_mem_buf(text.data(), static_cast<int>(text.size())));
+}
+
+CertificateOwner parseCertificate(const std::string& text) {
+    const BioOwner bio = reader(text);
+    return CertificateOwner(bio ? PEM_read_bio_X509(bio.get(), nullptr, noPassphrase, nullptr) : nullptr);
+}
+
+KeyOwner parseKey(const std::string& text) {
+    const BioOwner bio = reader(text);
+    return KeyOwner(bio ? PEM_read_bio_PrivateKey(bio.get(), nullptr, noPassphrase, nullptr) : nullptr);
+}
+
+std::optional<ServerCertificate> refuse(const std::filesystem::path& file, const std::string& why) {
+    ERR_clear_error();
+    fail(ErrorNumber::invalid, "The file " + file.string() + " " + why + ".");
+    return std::nullopt;
+}
+
+std::optional<ServerCertificate> load(const Pair& pair) {
+    const auto certificateText = readFile(pair.certificate);
+    if (!certificateText) {
+        return refuse(pair.certificate, "cannot be read");
+    }
+    const auto keyText = readFile(pair.key);
+    if (!keyText) {
+        return refuse(pair.key, "cannot be read");
+    }
+    const CertificateOwner certificate = parseCertificate(*certificateText);
+    if (!certificate) {
+        return refuse(pair.certificate, "holds no certificate in PEM form");
+    }
+    const KeyOwner key = parseKey(*keyText);
+    if (!key) {
+        return refuse(pair.key, "holds no private key in PEM form that can be read without a passphrase");
+    }
+    const int kind = EVP_PKEY_get_base_id(key.get());
+    if (kind != EVP_PKEY_RSA && kind != EVP_PKEY_EC) {
+        return refuse(pair.key, "holds a key that is neither RSA nor of an elliptic curve");
+    }
+    if (X509_check_private_key(certificate.get(), key.get()) != 1) {
+        return refuse(pair.key, "does not hold the key of the certificate beside it");
+    }
+    return ServerCertificate{pair.certificate, pair.key, kind == EVP_PKEY_RSA,
+                             sha256(*certificateText + *keyText), nullptr};
+}
+
+// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good
+// here too.
+bool isUsable(const Pair& pair) {
+    const auto certificateText = readFile(pair.certificate);
+    const auto keyText = readFile(pair.key);
+    const CertificateOwner certificate = certificateText ? parseCertificate(*certificateText) : nullptr;
+    const KeyOwner key = keyText ? parseKey(*keyText) : nullptr;
+    const bool usable = certificate && key && X509_check_private_key(certificate.get(), key.get()) == 1 &&
+                        X509_cmp_current_time(X509_get0_notAfter(certificate.get())) > 0;
+    ERR_clear_error();
+    return usable;
+}
+
+int makeOwn(const Pair& pair) {
+    const auto made = makeSelfSigned(namesOfThisHost());
+    if (!made) {
+        ERR_clear_error();
+        return fail(ErrorNumber::daemon, "The OpenSSL library cannot make a certificate for this server.");
+    }
+    if (replaceFile(pair.key, made->key, 0600) < 0) {
+        return -1;
+    }
+    return replaceFile(pair.certificate, made->certificate, 0644);
+}
+
+// Something has to stand in the configuration that a daemon is to test, also where nothing may be stored.
+std::optional<ServerCertificate> throwAway() {
+    auto folder = std::make_shared<ScratchFolder>();
+    const Pair pair{folder->path() / "server.crt", folder->path() / "server.key"};
+    if (!*folder || makeOwn(pair) < 0) {
+        return std::nullopt;
+    }
+    auto certificate = load(pair);
+    if (certificate) {
+        certificate->throwAway = std::move(folder);
+    }
+    return certificate;
+}
+
+bool isThere(const std::filesystem::path& path) {
+    std::error_code error;
+    return std::filesystem::exists(path, error);
+}
+
+} // namespace
+
+std::optional<ServerCertificate> serverCertificate() {
+    const Pair given{statePath("/etc/velt/tls/server.crt"), statePath("/etc/velt/tls/server.key")};
+    if (isThere(given.certificate) || isThere(given.key)) {
+        return load(given);
+    }
+    const Pair own{statePath("/var/lib/velt/tls/server.crt"), statePath("/var/lib/velt/tls/server.key")};
+    const StateLock lock;
+    if (!lock) {
+        return std::nullopt;
+    }
+    if (isUsable(own)) {
+        return load(own);
+    }
+    if (perform(Effect::store, "certificate", [&] { return makeOwn(own); }) < 0) {
+        return std::nullopt;
+    }
+    return isUsable(own) ? load(own) : throwAway();
+}
+
+} // namespace velt

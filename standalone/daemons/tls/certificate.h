@@ -1,0 +1,32 @@
+// The certificate of the FTPS service.
+#ifndef VELT_STANDALONE_DAEMONS_TLS_CERTIFICATE_H
+#define VELT_STANDALONE_DAEMONS_TLS_CERTIFICATE_H
+
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace velt {
+
+class ScratchFolder;
+
+struct ServerCertificate {
+    std::filesystem::path
+        certificate;           ///< PEM; the server's certificate first, then those that lead to its issuer
+    std::filesystem::path key; ///< PEM
+    bool isRsa = false;        ///< else it is an elliptic curve's
+    std::string fingerprint;   ///< changes when the certificate or its key does
+    std::shared_ptr<const ScratchFolder> throwAway; ///< holds the two files when they are for a test only
+};
+
+/// The administrator's certificate ("/etc/velt/tls/server.crt" and ".key" below the state root) if given,
+/// else a self-signed one, made at the first call and again once it has run out. Where the thread's hook
+/// leaves the store of it undone, a throw-away one that is gone with the result. Nothing, with the last error
+/// set, when a file cannot be read or written, key and certificate do not belong together, or the kind of key
+/// is neither RSA nor an elliptic curve. Thread-safe.
+std::optional<ServerCertificate> serverCertificate();
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,94 @@
+#include "standalone/journal/admin_log.h"
+
+#include "base/plain_text.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/journal/catalogue.h"
+#include "standalone/journal/log_database.h"
+#include "standalone/journal/request_actor.h"
+
+#include <syslog.h>
+
+#include <mutex>
+
+namespace velt {
+
+namespace {
+
+constexpr std::size_t longestText = 1024;
+constexpr std::size_t longestActor = 255;
+constexpr int longestPage = 1000;
+
+struct Connection {
+    std::mutex mutex;
+    std::unique_ptr<LogDatabase> database;
+};
+
+Connection& connection() {
+    static Connection instance;
+    return instance;
+}
+
+/// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held.
+/// Null, with the last error set, when it cannot be opened.
+LogDatabase* currentDatabase(Connection& open) {
+    if (open.database != nullptr && !open.database->isOwn()) {
+        fail(ErrorNumber::log,
+             "A process that was forked off while the administrator log was open cannot use it.");
+        return nullptr;
+    }
+    const std::filesystem::path path = statePath("/var/lib/velt/log.db");
+    if (open.database == nullptr || !open.database->leadsTo(path)) {
+        open.database.reset();
+        open.database = LogDatabase::open(path);
+    }
+    return open.database.get();
+}
+
+/// Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
+std::optional<LogRetention> retentionIfReadable() {
+    const LastErrorKept kept;
+    const std::optional<LogRetention> retention = loadRetention();
+    if (!retention) {
+        syslog(LOG_WARNING, "administrator log: nothing is removed: %s", lastErrorSentence().c_str());
+    }
+    return retention;
+}
+
+} // namespace
+
+LogEntry makeLogEntry(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
+    LogEntry entry;
+    entry.time = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
+    entry.category = category;
+    entry.level = level;
+    entry.event = event;
+    for (std::size_t i = 0; i < texts.size(); ++i) {
+        entry.texts[i] = plainText(texts[i] == nullptr ? "" : texts[i], longestText);
+    }
+    entry.sentence = sentenceOf(event, entry.texts);
+    entry.actor = plainText(requestActor().actor, longestActor);
+    entry.address = plainText(requestActor().address, longestActor);
+    return entry;
+}
+
+int storeLogEntry(LogEntry& entry) {
+    const std::optional<LogRetention> retention = retentionIfReadable();
+    Connection& open = connection();
+    const std::lock_guard lock(open.mutex);
+    LogDatabase* database = currentDatabase(open);
+    return database == nullptr ? -1 : database->append(entry, retention);
+}
+
+std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
+    if (filter.limit < 1 || filter.limit > longestPage) {
+        fail(ErrorNumber::invalid, "A page of the administrator log has 1 to 1000 entries.");
+        return std::nullopt;
+    }
+    Connection& open = connection();
+    const std::lock_guard lock(open.mutex);
+    LogDatabase* database = currentDatabase(open);
+    return database == nullptr ? std::nullopt : database->query(filter);
+}
+
+} // namespace velt

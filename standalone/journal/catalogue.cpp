@@ -1,0 +1,78 @@
+#include "standalone/journal/catalogue.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <string_view>
+
+namespace velt {
+
+namespace {
+
+constexpr std::array<CatalogueEntry, 20> entries{{
+    {0x11B00002, "The FTP service was enabled."},
+    {0x11B00006, "The FTP service was disabled."},
+    {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
+    {0x11B00009, "The FTP download limit was changed from %1 to %2."},
+    {0x11B0000A, "The passive port range of the FTP service was changed from %1 to %2."},
+    {0x11B00010, "Anonymous FTP login was allowed."},
+    {0x11B00011, "Anonymous FTP login was forbidden."},
+    {0x11B00012, "The FTP port was changed from %1 to %2."},
+    // Written last when the service comes up, after the settings that it came up with.
+    {0x11B00013, "The FTP service was started."},
+    // "Enabled" when plain FTP alone was the choice before, "Disabled" when it is from now on.
+    {0x11B00019, "FTP with encryption (FTPS) was set to \"%1\"."},
+    {0x11B00020, "Announcing the external address in passive mode was set to \"%1\"."},
+    {0x11B00021, "UTF-8 file names in the FTP service were set to \"%1\"."},
+    {0x11B00022, "The limit of FTP connections from one address was set to \"%1\"."},
+    {0x11B00024, "User \"%1\" was confined to the home folder in the FTP service."},
+    {0x11B00025, "User \"%1\" is no longer confined to the home folder in the FTP service."},
+    {0x11B00026, "Confining anonymous FTP users to one share was %1."},
+    {0x11B00027, "Confining FTP users to their home folders was set to \"%1\"."},
+    {0x11B00028, "The share that anonymous FTP users are confined to was set to \"%1\"."},
+    {0x11B00035, "The SFTP port was changed from %1 to %2."},
+    {0x11B00036, "The SFTP service was enabled."},
+}};
+
+std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4>& texts) {
+    char number[16];
+    std::snprintf(number, sizeof number, "0x%08X", event);
+    std::string sentence = std::string("Event ") + number;
+    const char* separator = ": ";
+    for (const std::string& text : texts) {
+        if (text.empty()) {
+            continue;
+        }
+        sentence += separator + text;
+        separator = ", ";
+    }
+    return sentence + ".";
+}
+
+} // namespace
+
+std::span<const CatalogueEntry> catalogue() {
+    return entries;
+}
+
+std::string sentenceOf(std::uint32_t event, const std::array<std::string, 4>& texts) {
+    const auto* const known =
+        std::find_if(entries.begin(), entries.end(),
+                     [event](const CatalogueEntry& entry) { return entry.event == event; });
+    if (known == entries.end()) {
+        return unknownSentence(event, texts);
+    }
+    std::string sentence;
+    std::string_view rest = known->sentence;
+    while (!rest.empty()) {
+        if (rest.size() >= 2 && rest[0] == '%' && rest[1] >= '1' && rest[1] <= '4') {
+            sentence += texts[static_cast<std::size_t>(rest[1] - '1')];
+            rest.remove_prefix(2);
+        } else {
+            sentence += rest[0];
+            rest.remove_prefix(1);
+        }
+    }
+    return sentence;
+}
+
+} // namespace velt

@@ -1,0 +1,138 @@
+#include "standalone/journal/event_file.h"
+
+#include "base/unique_fd.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+
+#include <fcntl.h>
+#include <json/json.h>
+#include <sys/file.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <ctime>
+
+namespace velt {
+
+namespace {
+
+constexpr std::size_t longestLine = 65536;
+
+/// "2026-11-21T06:30:11.123Z"
+std::string renderTime(std::chrono::system_clock::time_point time) {
+    const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
+    const std::time_t clock = seconds.time_since_epoch().count();
+    std::tm parts{};
+    gmtime_r(&clock, &parts);
+    char date[32];
+    std::strftime(date, sizeof date, "%Y-%m-%dT%H:%M:%S", &parts);
+    char text[48];
+    std::snprintf(text, sizeof text, "%s.%03dZ", date,
+                  static_cast<int>(std::chrono::floor<std::chrono::milliseconds>(time - seconds).count()));
+    return text;
+}
+
+int failToWrite(const std::filesystem::path& path, const char* why) {
+    return fail(ErrorNumber::event, "The event cannot be written to " + path.string() + ": " + why + ".");
+}
+
+/// The file under its lock, which keeps other writers from adding their lines in between. Opened anew for
+/// each line: another writer, or a program of the administrator's, may have renamed it meanwhile.
+UniqueFd openLocked(const std::filesystem::path& path) {
+    for (;;) {
+        UniqueFd fd(::open(path.c_str(), O_RDWR | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0640));
+        if (!fd) {
+            return fd;
+        }
+        while (::flock(fd.get(), LOCK_EX) != 0) {
+            if (errno != EINTR) {
+                return UniqueFd();
+            }
+        }
+        if (isSameFile(fd.get(), path)) {
+            return fd;
+        }
+    }
+}
+
+std::filesystem::path kept(const std::filesystem::path& path, int number) {
+    return path.string() + "." + std::to_string(number);
+}
+
+/// From the oldest on, so that a process which is killed on the way leaves a number free, and no event lost.
+/// Where a file cannot be put away, the newest grows on: a limit is worth less than an event.
+void rotate(const std::filesystem::path& path) {
+    for (int number = keptEventFiles - 1; number >= 0; --number) {
+        const std::filesystem::path from = number == 0 ? path : kept(path, number);
+        if (::rename(from.c_str(), kept(path, number + 1).c_str()) != 0 && errno != ENOENT) {
+            ::syslog(LOG_WARNING, "%s cannot be put away: %s", from.c_str(), std::strerror(errno));
+            return;
+        }
+    }
+}
+
+/// Half a line, as a crash of the machine leaves it, would take the next one with it.
+bool endsInALine(int fd, off_t size) {
+    char last = '\n';
+    return size == 0 || ::pread(fd, &last, 1, size - 1) != 1 || last == '\n';
+}
+
+/// A line that does not fit on the disk is taken back, or the next one would be lost with it.
+int writeLine(int fd, off_t size, const std::string& line, const std::filesystem::path& path) {
+    const ssize_t written = ::write(fd, line.data(), line.size());
+    if (written == static_cast<ssize_t>(line.size())) {
+        return 0;
+    }
+    const int error = written < 0 ? errno : ENOSPC;
+    if (::ftruncate(fd, size) != 0) {
+        return failToWrite(path, "half a line is left in it");
+    }
+    return failToWrite(path, std::strerror(error));
+}
+
+} // namespace
+
+std::string renderEvent(const SystemEvent& event) {
+    Json::Value parameters(Json::objectValue);
+    for (const auto& [key, value] : event.parameters) {
+        parameters[key] = value;
+    }
+    Json::Value line(Json::objectValue);
+    line["time"] = renderTime(event.time);
+    line["event"] = event.name;
+    line["parameters"] = std::move(parameters);
+    line["actor"] = event.actor;
+    line["address"] = event.address;
+    Json::StreamWriterBuilder builder;
+    builder["indentation"] = "";
+    builder["emitUTF8"] = false;
+    return Json::writeString(builder, line);
+}
+
+int appendEvent(const SystemEvent& event) {
+    const std::filesystem::path path = statePath("/var/log/velt/events.jsonl");
+    const std::string line = renderEvent(event) + "\n";
+    if (line.size() > longestLine) {
+        return failToWrite(path, "it is longer than 64 KiB");
+    }
+    std::error_code error;
+    std::filesystem::create_directories(path.parent_path(), error);
+    UniqueFd fd = openLocked(path);
+    off_t size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
+    if (size > 0 && static_cast<std::size_t>(size) + line.size() > largestEventFile) {
+        rotate(path);
+        fd.reset(); // or the lock of a file that could not be put away would be waited for
+        fd = openLocked(path);
+        size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
+    }
+    if (size < 0) {
+        return failToWrite(path, std::strerror(errno));
+    }
+    return writeLine(fd.get(), size, endsInALine(fd.get(), size) ? line : "\n" + line, path);
+}
+
+} // namespace velt

@@ -1,0 +1,263 @@
+#include "standalone/journal/log_database.h"
+
+#include "base/unique_fd.h"
+#include "standalone/core/last_error.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <chrono>
+#include <cstring>
+#include <thread>
+
+namespace velt {
+
+namespace {
+
+constexpr int busyMilliseconds = 5000;
+
+// The number of this table's form, kept in the database itself.
+constexpr std::int64_t formVersion = 1;
+
+constexpr const char* tableSql = R"(
+    CREATE TABLE entry (
+        id INTEGER PRIMARY KEY AUTOINCREMENT,
+        time INTEGER NOT NULL,
+        category INTEGER NOT NULL,
+        level INTEGER NOT NULL,
+        event INTEGER NOT NULL,
+        text1 TEXT NOT NULL,
+        text2 TEXT NOT NULL,
+        text3 TEXT NOT NULL,
+        text4 TEXT NOT NULL,
+        sentence TEXT NOT NULL,
+        actor TEXT NOT NULL,
+        address TEXT NOT NULL);
+    CREATE INDEX entry_time ON entry (time);
+    PRAGMA user_version = 1;
+)";
+
+constexpr const char* insertSql =
+    "INSERT INTO entry (time, category, level, event, text1, text2, text3, text4, sentence, actor, address) "
+    "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11)";
+
+constexpr const char* querySql =
+    "SELECT id, time, category, level, event, text1, text2, text3, text4, sentence, actor, address FROM "
+    "entry "
+    "WHERE (?1 IS NULL OR time >= ?1) AND (?2 IS NULL OR event = ?2) AND (?3 IS NULL OR actor = ?3) "
+    "AND (?4 IS NULL OR id < ?4) ORDER BY id DESC LIMIT ?5";
+
+std::int64_t millisecondsOf(std::chrono::system_clock::time_point time) {
+    return std::chrono::floor<std::chrono::milliseconds>(time.time_since_epoch()).count();
+}
+
+int execute(sqlite3* database, const char* sql) {
+    return sqlite3_exec(database, sql, nullptr, nullptr, nullptr);
+}
+
+/// While another process does the same, SQLite refuses the switch at once instead of waiting.
+int switchToWal(sqlite3* database) {
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(busyMilliseconds);
+    for (;;) {
+        const int result = execute(database, "PRAGMA journal_mode = WAL");
+        if (result != SQLITE_BUSY || std::chrono::steady_clock::now() > deadline) {
+            return result;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    }
+}
+
+/// Names and addresses are in it: SQLite would make the file readable to all. Its side files take its mode.
+int makeFile(const std::filesystem::path& path) {
+    std::error_code error;
+    std::filesystem::create_directories(path.parent_path(), error);
+    const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
+    if (!fd) {
+        return fail(ErrorNumber::log, "The administrator log " + path.string() +
+                                          " cannot be opened: " + std::strerror(errno) + ".");
+    }
+    return 0;
+}
+
+} // namespace
+
+struct LogDatabase::Statements {
+    Statement begin;
+    Statement commit;
+    Statement insert;
+    Statement removeByCount;
+    Statement removeByAge;
+    Statement query;
+};
+
+LogDatabase::LogDatabase(std::filesystem::path path) : path_(std::move(path)), process_(getpid()) {}
+
+LogDatabase::~LogDatabase() {
+    if (!isOwn()) {
+        static_cast<void>(statements_.release());
+        return;
+    }
+    statements_.reset();
+    sqlite3_close(database_);
+}
+
+int LogDatabase::failHere(const char* what) const {
+    return fail(ErrorNumber::log, "The administrator log " + path_.string() + " cannot be " + what + ": " +
+                                      sqlite3_errmsg(database_) + ".");
+}
+
+std::unique_ptr<LogDatabase> LogDatabase::open(const std::filesystem::path& path) {
+    if (makeFile(path) < 0) {
+        return nullptr;
+    }
+    std::unique_ptr<LogDatabase> log(new LogDatabase(path));
+    const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
+    if (sqlite3_open_v2(path.c_str(), &log->database_, flags, nullptr) != SQLITE_OK) {
+        log->failHere("opened");
+        return nullptr;
+    }
+    return log->prepare() < 0 ? nullptr : std::move(log);
+}
+
+int LogDatabase::prepare() {
+    sqlite3_busy_timeout(database_, busyMilliseconds);
+    // With the log ahead of the table, a commit that is not forced to the disk survives the end of the
+    // process; a power failure may take the last entries, never the table's form.
+    if (switchToWal(database_) != SQLITE_OK ||
+        execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
+        return failHere("opened");
+    }
+    return makeTable() < 0 ? -1 : prepareStatements();
+}
+
+int LogDatabase::makeTable() {
+    // Under the write lock, or two processes could both see that there is no table yet.
+    if (execute(database_, "BEGIN IMMEDIATE") != SQLITE_OK) {
+        return failHere("opened");
+    }
+    Statement version;
+    if (version.prepare(database_, "PRAGMA user_version") != SQLITE_OK || version.step() != SQLITE_ROW) {
+        return failHere("opened");
+    }
+    const std::int64_t found = version.number(0);
+    version.reset();
+    if (found != 0 && found != formVersion) {
+        return fail(ErrorNumber::log, "The administrator log " + path_.string() + " has form " +
+                                          std::to_string(found) + ", which this version does not know.");
+    }
+    if (found == 0 && execute(database_, tableSql) != SQLITE_OK) {
+        return failHere("made");
+    }
+    return execute(database_, "COMMIT") == SQLITE_OK ? 0 : failHere("made");
+}
+
+int LogDatabase::prepareStatements() {
+    statements_ = std::make_unique<Statements>();
+    const auto prepared = [this](Statement& statement, const char* sql) {
+        return statement.prepare(database_, sql) == SQLITE_OK;
+    };
+    if (prepared(statements_->begin, "BEGIN IMMEDIATE") && prepared(statements_->commit, "COMMIT") &&
+        prepared(statements_->insert, insertSql) &&
+        prepared(statements_->removeByCount, "DELETE FROM entry WHERE id <= ?1") &&
+        prepared(statements_->removeByAge, "DELETE FROM entry WHERE time < ?1") &&
+        prepared(statements_->query, querySql)) {
+        return 0;
+    }
+    return failHere("used");
+}
+
+bool LogDatabase::isOwn() const {
+    return process_ == getpid();
+}
+
+bool LogDatabase::leadsTo(const std::filesystem::path& path) const {
+    int moved = 0;
+    return path == path_ &&
+           sqlite3_file_control(database_, "main", SQLITE_FCNTL_HAS_MOVED, &moved) == SQLITE_OK && moved == 0;
+}
+
+int LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& retention) {
+    if (statements_->begin.run() != SQLITE_DONE) {
+        return failHere("written");
+    }
+    int result = insert(entry);
+    if (result == SQLITE_DONE && retention) {
+        result = removeOld(entry, *retention);
+    }
+    if (result == SQLITE_DONE) {
+        result = statements_->commit.run();
+    }
+    if (result == SQLITE_DONE) {
+        return 0;
+    }
+    failHere("written");
+    if (sqlite3_get_autocommit(database_) == 0) {
+        execute(database_, "ROLLBACK");
+    }
+    return -1;
+}
+
+int LogDatabase::insert(LogEntry& entry) {
+    Statement& insert = statements_->insert;
+    insert.bind(1, millisecondsOf(entry.time));
+    insert.bind(2, entry.category);
+    insert.bind(3, entry.level);
+    insert.bind(4, std::int64_t{entry.event});
+    for (int i = 0; i < 4; ++i) {
+        insert.bind(5 + i, entry.texts[static_cast<std::size_t>(i)]);
+    }
+    insert.bind(9, entry.sentence);
+    insert.bind(10, entry.actor);
+    insert.bind(11, entry.address);
+    const int result = insert.run();
+    entry.id = sqlite3_last_insert_rowid(database_);
+    return result;
+}
+
+int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention) {
+    if (retention.maxEntries > 0) {
+        statements_->removeByCount.bind(1, newest.id - retention.maxEntries);
+        if (const int result = statements_->removeByCount.run(); result != SQLITE_DONE) {
+            return result;
+        }
+    }
+    if (retention.maxAgeDays > 0) {
+        statements_->removeByAge.bind(1,
+                                      millisecondsOf(newest.time - std::chrono::days(retention.maxAgeDays)));
+        return statements_->removeByAge.run();
+    }
+    return SQLITE_DONE;
+}
+
+std::optional<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
+    Statement& query = statements_->query;
+    query.bind(1, filter.since ? std::optional(millisecondsOf(*filter.since)) : std::nullopt);
+    query.bind(2, filter.event ? std::optional(std::int64_t{*filter.event}) : std::nullopt);
+    query.bind(3, filter.actor);
+    query.bind(4, filter.beforeId);
+    query.bind(5, filter.limit);
+    std::vector<LogEntry> entries;
+    int result = query.step();
+    for (; result == SQLITE_ROW; result = query.step()) {
+        LogEntry& entry = entries.emplace_back();
+        entry.id = query.number(0);
+        entry.time = std::chrono::system_clock::time_point(std::chrono::milliseconds(query.number(1)));
+        entry.category = static_cast<int>(query.number(2));
+        entry.level = static_cast<int>(query.number(3));
+        entry.event = static_cast<unsigned>(query.number(4));
+        for (int i = 0; i < 4; ++i) {
+            entry.texts[static_cast<std::size_t>(i)] = query.text(5 + i);
+        }
+        entry.sentence = query.text(9);
+        entry.actor = query.text(10);
+        entry.address = query.text(11);
+    }
+    if (result != SQLITE_DONE) {
+        failHere("read");
+    }
+    query.reset();
+    return result == SQLITE_DONE ? std::optional(std::move(entries)) : std::nullopt;
+}
+
+} // namespace velt

@@ -1,0 +1,64 @@
+// The administrator log's database: one connection to it.
+#ifndef VELT_STANDALONE_JOURNAL_LOG_DATABASE_H
+#define VELT_STANDALONE_JOURNAL_LOG_DATABASE_H
+
+#include "standalone/journal/log_entry.h"
+#include "standalone/journal/log_retention.h"
+#include "standalone/journal/statement.h"
+
+#include <sys/types.h>
+
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <vector>
+
+namespace velt {
+
+/// Not thread-safe; several connections may be in use at once, in several processes, too.
+class LogDatabase {
+public:
+    /// Opens the database, which is made when it is missing. Null, with the last error set, when that is
+    /// impossible.
+    static std::unique_ptr<LogDatabase> open(const std::filesystem::path& path);
+
+    /// Closes the connection, unless this process has it from its parent: its locks are the parent's.
+    ~LogDatabase();
+    LogDatabase(const LogDatabase&) = delete;
+    LogDatabase& operator=(const LogDatabase&) = delete;
+
+    /// Whether this process opened the connection. One that it has from its parent cannot be used, nor can
+    /// the same file be opened again beside it, since SQLite takes the parent's locks for its own.
+    bool isOwn() const;
+
+    /// Whether this is a connection to the file that stands at `path` now.
+    bool leadsTo(const std::filesystem::path& path) const;
+
+    /// Adds the entry, whose id it sets, and removes what `retention` (when given) no longer keeps, together
+    /// or not at all. Negative, with the last error set, on failure.
+    int append(LogEntry& entry, const std::optional<LogRetention>& retention);
+
+    /// As queryLog.
+    std::optional<std::vector<LogEntry>> query(const LogFilter& filter);
+
+private:
+    explicit LogDatabase(std::filesystem::path path);
+
+    int prepare();
+    int makeTable();
+    int prepareStatements();
+    int insert(LogEntry& entry);
+    int removeOld(const LogEntry& newest, const LogRetention& retention);
+    int failHere(const char* what) const;
+
+    struct Statements;
+
+    std::filesystem::path path_;
+    pid_t process_;
+    sqlite3* database_ = nullptr;
+    std::unique_ptr<Statements> statements_;
+};
+
+} // namespace velt
+
+#endif

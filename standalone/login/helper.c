@@ -1,0 +1,166 @@
+#include "standalone/login/helper.h"
+
+#include <errno.h>
+#include <fcntl.h>
+#include <poll.h>
+#include <signal.h>
+#include <spawn.h>
+#include <stdio.h>
+#include <string.h>
+#include <sys/wait.h>
+#include <time.h>
+#include <unistd.h>
+
+static int spawn(char* const arguments[], int errors, pid_t* child) {
+    static char* const no_environment[] = {NULL};
+    posix_spawn_file_actions_t files;
+    posix_spawnattr_t attributes;
+    sigset_t signals;
+
+    int failure = posix_spawn_file_actions_init(&files);
+    if (failure != 0) {
+        return failure;
+    }
+    failure = posix_spawnattr_init(&attributes);
+    if (failure != 0) {
+        (void)posix_spawn_file_actions_destroy(&files);
+        return failure;
+    }
+    (void)sigfillset(&signals);
+    (void)posix_spawnattr_setsigdefault(&attributes, &signals);
+    (void)sigemptyset(&signals);
+    (void)posix_spawnattr_setsigmask(&attributes, &signals);
+    failure = posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+    if (failure == 0) {
+        failure = posix_spawn_file_actions_adddup2(&files, errors, STDERR_FILENO);
+    }
+    if (failure == 0) {
+        failure = posix_spawn_file_actions_addopen(&files, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    }
+    if (failure == 0) {
+        failure = posix_spawn_file_actions_addopen(&files, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+    }
+    /* The client's connection and the server's keys are not the program's. */
+    if (failure == 0) {
+        failure = posix_spawn_file_actions_addclosefrom_np(&files, STDERR_FILENO + 1);
+    }
+    if (failure == 0) {
+        failure = posix_spawn(child, arguments[0], &files, &attributes, arguments, no_environment);
+    }
+    (void)posix_spawnattr_destroy(&attributes);
+    (void)posix_spawn_file_actions_destroy(&files);
+    return failure;
+}
+
+static long long milliseconds(void) {
+    struct timespec now;
+
+    (void)clock_gettime(CLOCK_MONOTONIC, &now);
+    return (long long)now.tv_sec * 1000 + now.tv_nsec / 1000000;
+}
+
+/* Reads until the program has closed its end; FALSE when that takes too long. */
+static int read_words(int fd, long long deadline, char* words, size_t size) {
+    char rest[256];
+    size_t length = 0;
+
+    for (;;) {
+        struct pollfd wanted = {fd, POLLIN, 0};
+        long long left = deadline - milliseconds();
+        int full = length + 1 >= size;
+
+        if (left <= 0) {
+            return 0;
+        }
+        if (poll(&wanted, 1, (int)left) <= 0) {
+            continue;
+        }
+        ssize_t got = full ? read(fd, rest, sizeof(rest)) : read(fd, words + length, size - 1 - length);
+        if (got < 0 && errno != EINTR) {
+            return 0;
+        }
+        if (got == 0) {
+            return 1;
+        }
+        if (got > 0 && !full) {
+            length += (size_t)got;
+            words[length] = '\0';
+        }
+    }
+}
+
+static void make_printable(char* words) {
+    size_t length = strlen(words);
+
+    while (length > 0 && words[length - 1] == '\n') {
+        words[--length] = '\0';
+    }
+    for (char* c = words; *c != '\0'; c++) {
+        if ((unsigned char)*c < 0x20 || *c == 0x7f) {
+            *c = ' ';
+        }
+    }
+}
+
+/* The end of a program that has closed its standard error is near, unless it hangs there. */
+static int reap(pid_t child, long long deadline, int* status) {
+    const struct timespec pause = {0, 1000000};
+
+    for (;;) {
+        pid_t ended = waitpid(child, status, WNOHANG);
+        if (ended == child) {
+            return 1;
+        }
+        if ((ended < 0 && errno != EINTR) || milliseconds() >= deadline) {
+            return 0;
+        }
+        (void)nanosleep(&pause, NULL);
+    }
+}
+
+static int await(pid_t child, int errors, int limit, char* words, size_t size) {
+    long long deadline = milliseconds() + (long long)limit * 1000;
+    int status = 0;
+
+    if (!read_words(errors, deadline, words, size) || !reap(child, deadline, &status)) {
+        (void)kill(child, SIGKILL);
+        /* It may be stuck in the kernel, where no signal ends it. */
+        (void)reap(child, milliseconds() + 100, &status);
+        (void)snprintf(words, size, "it takes too long");
+        return 0;
+    }
+    make_printable(words);
+    if (!WIFEXITED(status) || WEXITSTATUS(status) != 0) {
+        if (words[0] == '\0') {
+            (void)snprintf(words, size, "it ended without a word");
+        }
+        return 0;
+    }
+    return 1;
+}
+
+int velt_helper_run(char* const arguments[], int limit, char* words, size_t size) {
+    int ends[2] = {-1, -1};
+    pid_t child = -1;
+
+    words[0] = '\0';
+    if (pipe2(ends, O_CLOEXEC) < 0) {
+        (void)snprintf(words, size, "%s", strerror(errno));
+        return 0;
+    }
+    /* Where the standard files are closed, the new ones must not take their places. */
+    int errors = fcntl(ends[1], F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+    int failure = errors < 0 ? errno : spawn(arguments, errors, &child);
+    if (errors >= 0) {
+        (void)close(errors);
+    }
+    (void)close(ends[1]);
+    int good = 0;
+    if (failure != 0) {
+        (void)snprintf(words, size, "%s: %s", arguments[0], strerror(failure));
+    } else {
+        good = await(child, ends[0], limit, words, size);
+    }
+    (void)close(ends[0]);
+    return good;
+}

@@ -1,0 +1,176 @@
+/* Gives each login the root directory that is made for it.
+ *
+ * As soon as a password is right, the session gets a mount namespace of its own, in which a program of ours
+ * (VeltLoginRoot) makes one folder show what the login may see. That folder is the DefaultRoot, and the
+ * directory of <Anonymous>, in the configuration. It is empty for everybody else, so that a session which
+ * were led there without us would see nothing. Where the program refuses a login, the password counts as
+ * wrong.
+ */
+#include "conf.h"
+#include "privs.h"
+
+#include "standalone/login/helper.h"
+
+#include <sched.h>
+
+#define MODULE_VERSION "mod_velt_chroot/2.0"
+
+module velt_chroot_module;
+
+/* Far more than a login takes, and less than clients wait. */
+static const int longest_run = 20;
+
+/* For whom this session's view was made; a login that fails later may be followed by another user's. */
+static const char* made_for = NULL;
+
+/* "1000,1000,27": the primary group, then all that the daemon knows of. NULL when they cannot be told. */
+static char* groups_text(pool* p, const struct passwd* pw) {
+    array_header* gids = NULL;
+    array_header* names = NULL;
+
+    /* Every source tells the primary group at least; without an answer, rules and refusals of groups would
+     * be skipped. */
+    char* text = pstrcat(p, pr_gid2str(p, pw->pw_gid), NULL);
+    if (pr_auth_getgroups(p, pw->pw_name, &gids, &names) < 0) {
+        return NULL;
+    }
+    for (int i = 0; gids != NULL && i < (int)gids->nelts; i++) {
+        text = pstrcat(p, text, ",", pr_gid2str(p, ((const gid_t*)gids->elts)[i]), NULL);
+    }
+    return text;
+}
+
+/* The look-ups that follow may reuse what the daemon's answer points to. */
+static struct passwd* copy_account(pool* p, const char* user) {
+    const struct passwd* known = user != NULL ? pr_auth_getpwnam(p, user) : NULL;
+    if (known == NULL || known->pw_name == NULL || known->pw_dir == NULL) {
+        return NULL;
+    }
+    struct passwd* copy = pcalloc(p, sizeof(struct passwd));
+    copy->pw_name = pstrdup(p, known->pw_name);
+    copy->pw_dir = pstrdup(p, known->pw_dir);
+    copy->pw_uid = known->pw_uid;
+    copy->pw_gid = known->pw_gid;
+    return copy;
+}
+
+static int run_program(pool* p, const config_rec* c, const char* kind, const char* root, const char* user) {
+    char words[1024] = "the account cannot be told";
+    int good = FALSE;
+
+    struct passwd* pw = copy_account(p, user);
+    char* groups = pw != NULL ? groups_text(p, pw) : NULL;
+    if (groups != NULL) {
+        char* arguments[] = {c->argv[0],
+                             c->argv[1],
+                             pstrdup(p, kind),
+                             pstrdup(p, root),
+                             pw->pw_name,
+                             pstrdup(p, pr_uid2str(p, pw->pw_uid)),
+                             groups,
+                             pw->pw_dir,
+                             c->argc > 3 && session.anon_config != NULL ? c->argv[3] : NULL,
+                             NULL};
+        /* Only where everything may be seen there is nothing to be made. */
+        int isolated = strcmp(kind, "server") != 0;
+        PRIVS_ROOT
+        if (isolated && strcmp(root, "/") == 0) {
+            (void)snprintf(words, sizeof(words), "no DefaultRoot to be made");
+        } else if (isolated && unshare(CLONE_NEWNS) < 0) {
+            (void)snprintf(words, sizeof(words), "no mount namespace: %s", strerror(errno));
+        } else {
+            good = velt_helper_run(arguments, longest_run, words, sizeof(words));
+        }
+        PRIVS_RELINQUISH
+    }
+    if (!good) {
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login of '%s' refused: %s", user, words);
+    } else if (words[0] != '\0') {
+        pr_log_pri(PR_LOG_WARNING, MODULE_VERSION ": login of '%s': %s", user, words);
+    }
+    return good;
+}
+
+/* Makes `root` show what the user who logs in may see. */
+static int make_view(const char* root, int anonymous) {
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "VeltLoginRoot", FALSE);
+    const char* user = session.user;
+
+    made_for = NULL;
+    if (c == NULL || user == NULL) {
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login refused: no VeltLoginRoot");
+        return FALSE;
+    }
+    pool* p = make_sub_pool(session.pool);
+    int good = run_program(p, c, anonymous ? "anonymous" : c->argv[2], root, user);
+    destroy_pool(p);
+    if (good) {
+        made_for = pstrdup(session.pool, user);
+    }
+    return good;
+}
+
+/* A local user's password has been checked. */
+static void on_authenticated(const void* data, void* ignored) {
+    /* The daemon goes by what stands here when all listeners have been told. */
+    int* code = (int*)data;
+    (void)ignored;
+
+    if (code == NULL || *code < 0 || session.anon_config != NULL) {
+        return;
+    }
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
+    if (!make_view(c != NULL ? c->argv[0] : "/", FALSE)) {
+        *code = PR_AUTH_DISABLEDPWD;
+    }
+}
+
+/* The session is about to enter its root directory. */
+static void on_chroot(const void* root, void* ignored) {
+    int good = FALSE;
+    (void)ignored;
+
+    if (session.anon_config != NULL) {
+        good = make_view(root, TRUE);
+    } else {
+        good = made_for != NULL && session.user != NULL && strcmp(made_for, session.user) == 0;
+    }
+    if (!good) {
+        pr_response_send(R_530, "Login incorrect.");
+        pr_session_end(0);
+    }
+}
+
+/* usage: VeltLoginRoot program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
+MODRET set_velt_login_root(cmd_rec* cmd) {
+    if (cmd->argc < 4 || cmd->argc > 5) {
+        CONF_ERROR(cmd, "wrong number of parameters");
+    }
+    CHECK_CONF(cmd, CONF_ROOT);
+    if (*(const char*)cmd->argv[1] != '/' || *(const char*)cmd->argv[2] != '/') {
+        CONF_ERROR(cmd, "needs absolute paths");
+    }
+    if (cmd->argc == 5) {
+        (void)add_config_param_str(cmd->argv[0], 4, cmd->argv[1], cmd->argv[2], cmd->argv[3], cmd->argv[4]);
+    } else {
+        (void)add_config_param_str(cmd->argv[0], 3, cmd->argv[1], cmd->argv[2], cmd->argv[3]);
+    }
+    return PR_HANDLED(cmd);
+}
+
+static int velt_sess_init(void) {
+    if (pr_event_register(&velt_chroot_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
+        pr_event_register(&velt_chroot_module, "core.chroot", on_chroot, NULL) < 0) {
+        return -1;
+    }
+    return 0;
+}
+
+static conftable velt_conftab[] = {
+    {"VeltLoginRoot", set_velt_login_root, NULL},
+    {NULL, NULL, NULL},
+};
+
+module velt_chroot_module = {
+    NULL, NULL, 0x20, "velt_chroot", velt_conftab, NULL, NULL, NULL, velt_sess_init, MODULE_VERSION, NULL, 0,
+};

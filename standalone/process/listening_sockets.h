@@ -1,0 +1,41 @@
+// Who listens on which TCP port, read from the kernel's tables; no connection is made.
+#ifndef VELT_STANDALONE_PROCESS_LISTENING_SOCKETS_H
+#define VELT_STANDALONE_PROCESS_LISTENING_SOCKETS_H
+
+#include <sys/types.h>
+
+#include <map>
+#include <string>
+#include <vector>
+
+namespace velt {
+
+struct ListeningSocket {
+    int port = 0;
+    unsigned long inode = 0;
+    uid_t user = 0; ///< who opened it
+};
+
+/// The listening TCP sockets, IPv4 and IPv6, of the network namespace in which the process `pid` lives; 0 is
+/// the caller.
+std::vector<ListeningSocket> listeningSockets(pid_t pid = 0);
+
+/// Whether the process itself holds a listening socket on the port. Of a process that does not let this one
+/// see its sockets: whether its user has one there.
+bool listensOn(pid_t pid, int port);
+
+struct SocketOwner {
+    pid_t pid = 0; ///< 0: unknown, since its process belongs to another user or namespace
+    std::string program;
+};
+
+/// The owners of these sockets, by inode. Sockets without an owner that may be seen are missing. Of several
+/// processes that share a socket the one with the smallest pid counts.
+std::map<unsigned long, SocketOwner> ownersOf(const std::vector<ListeningSocket>& sockets);
+
+/// The owner in words, for people: "nginx (process 812)", or "another program" when it is unknown.
+std::string describeOwner(const SocketOwner& owner);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,190 @@
+#include "standalone/process/process_identity.h"
+
+#include <fcntl.h>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <charconv>
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <thread>
+
+namespace velt {
+namespace {
+
+struct ProcessStat {
+    char state = 0;
+    pid_t parent = 0;
+    unsigned long long startTime = 0;
+};
+
+std::optional<ProcessStat> readStat(pid_t pid) {
+    std::ifstream file("/proc/" + std::to_string(pid) + "/stat");
+    std::string line;
+    if (!std::getline(file, line)) {
+        return std::nullopt;
+    }
+    // The program's name stands in parentheses and may itself contain blanks and parentheses.
+    const auto nameEnd = line.rfind(')');
+    if (nameEnd == std::string::npos) {
+        return std::nullopt;
+    }
+    std::istringstream fields(line.substr(nameEnd + 1));
+    ProcessStat stat;
+    fields >> stat.state >> stat.parent;
+    constexpr int fieldsBetweenParentAndStart = 17;
+    std::string skipped;
+    for (int field = 0; field < fieldsBetweenParentAndStart; ++field) {
+        fields >> skipped;
+    }
+    fields >> stat.startTime;
+    if (!fields) {
+        return std::nullopt;
+    }
+    return stat;
+}
+
+bool hasEnded(const ProcessStat& stat) {
+    return stat.state == 'Z' || stat.state == 'X';
+}
+
+struct Relation {
+    ProcessId process;
+    pid_t parent;
+};
+
+std::vector<Relation> allProcesses() {
+    std::vector<Relation> all;
+    for (const pid_t pid : allPids()) {
+        if (const auto stat = readStat(pid); stat && !hasEnded(*stat)) {
+            all.push_back({{pid, stat->startTime}, stat->parent});
+        }
+    }
+    return all;
+}
+
+std::vector<ProcessId> descendantsAmong(const std::vector<Relation>& all, pid_t ancestor) {
+    std::vector<ProcessId> found;
+    std::vector<pid_t> open{ancestor};
+    while (!open.empty()) {
+        const pid_t parent = open.back();
+        open.pop_back();
+        for (const Relation& relation : all) {
+            if (relation.parent == parent) {
+                found.push_back(relation.process);
+                open.push_back(relation.process.pid);
+            }
+        }
+    }
+    return found;
+}
+
+} // namespace
+
+std::vector<pid_t> allPids() {
+    std::vector<pid_t> pids;
+    std::error_code error;
+    for (std::filesystem::directory_iterator entry("/proc", error), end; !error && entry != end;
+         entry.increment(error)) {
+        const std::string name = entry->path().filename().string();
+        pid_t pid = 0;
+        const auto [rest, problem] = std::from_chars(name.data(), name.data() + name.size(), pid);
+        if (problem == std::errc{} && rest == name.data() + name.size()) {
+            pids.push_back(pid);
+        }
+    }
+    std::sort(pids.begin(), pids.end());
+    return pids;
+}
+
+std::string bootId() {
+    std::ifstream file("/proc/sys/kernel/random/boot_id");
+    std::string id;
+    std::getline(file, id);
+    return id;
+}
+
+std::optional<ProcessId> identifyProcess(pid_t pid) {
+    const auto stat = readStat(pid);
+    if (!stat || hasEnded(*stat)) {
+        return std::nullopt;
+    }
+    return ProcessId{pid, stat->startTime};
+}
+
+bool isAlive(const ProcessId& process) {
+    return process && identifyProcess(process.pid) == process;
+}
+
+void signalProcess(const ProcessId& process, int signal) {
+    if (!process) {
+        return;
+    }
+    // The descriptor stands for one process for ever. What is compared after it was opened is therefore what
+    // the signal reaches, even when the pid changes hands meanwhile.
+    const int descriptor = static_cast<int>(::syscall(SYS_pidfd_open, process.pid, 0));
+    if (descriptor < 0) {
+        return;
+    }
+    if (isAlive(process)) {
+        ::syscall(SYS_pidfd_send_signal, descriptor, signal, nullptr, 0);
+    }
+    ::close(descriptor);
+}
+
+std::vector<ProcessId> descendantsOf(pid_t ancestor) {
+    return descendantsAmong(allProcesses(), ancestor);
+}
+
+std::vector<ProcessId> livingTrees(const std::vector<ProcessId>& roots) {
+    std::vector<ProcessId> living;
+    const auto add = [&living](const ProcessId& process) {
+        if (std::find(living.begin(), living.end(), process) == living.end()) {
+            living.push_back(process);
+        }
+    };
+    const std::vector<Relation> all = allProcesses();
+    for (const ProcessId& root : roots) {
+        if (!isAlive(root)) {
+            continue;
+        }
+        add(root);
+        for (const ProcessId& process : descendantsAmong(all, root.pid)) {
+            add(process);
+        }
+    }
+    return living;
+}
+
+bool endProcesses(const std::function<std::vector<ProcessId>()>& remaining,
+                  std::chrono::milliseconds patience) {
+    using Clock = std::chrono::steady_clock;
+    const auto killTime = Clock::now() + patience;
+    const auto giveUpTime = killTime + std::chrono::seconds(1);
+    std::vector<ProcessId> asked;
+    for (;;) {
+        const std::vector<ProcessId> processes = remaining();
+        if (processes.empty()) {
+            return true;
+        }
+        const auto now = Clock::now();
+        if (now >= giveUpTime) {
+            return false;
+        }
+        for (const ProcessId& process : processes) {
+            if (now >= killTime) {
+                signalProcess(process, SIGKILL);
+            } else if (std::find(asked.begin(), asked.end(), process) == asked.end()) {
+                signalProcess(process, SIGTERM);
+                asked.push_back(process);
+            }
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    }
+}
+
+} // namespace velt

@@ -1,0 +1,21 @@
+// Stands in for the rendering of configurations: what the services start is the test daemon.
+#ifndef VELT_TESTS_STANDALONE_CONTROL_PLAN_DOUBLE_H
+#define VELT_TESTS_STANDALONE_CONTROL_PLAN_DOUBLE_H
+
+#include <string>
+#include <vector>
+
+namespace velt::test {
+
+/// How the next plans are made; the ports and the rest follow from the stored settings.
+struct PlanDouble {
+    bool refuse = false;                  ///< as if the daemon's own test had refused the configuration
+    std::vector<std::string> ftpOptions;  ///< further arguments of the FTP daemon
+    std::vector<std::string> sftpOptions; ///< of the SFTP daemon
+};
+
+PlanDouble& planDouble();
+
+} // namespace velt::test
+
+#endif

@@ -1,0 +1,136 @@
+// Supervisors that end without having been asked to.
+#include "standalone/standalone.h"
+#include "tests/standalone/control/services_fixture.h"
+
+#include <csignal>
+#include <optional>
+#include <thread>
+
+namespace velt::test {
+namespace {
+
+using std::chrono::milliseconds;
+using std::chrono::seconds;
+
+class ServiceWatchTest : public ServicesTest {
+protected:
+    void SetUp() override {
+        ServicesTest::SetUp();
+        storeSftp(true);
+        ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+    }
+
+    void TearDown() override {
+        unwatchServices();
+        ServicesTest::TearDown();
+    }
+
+    static void kill(const ProcessId& process) {
+        signalProcess(process, SIGKILL);
+        ASSERT_TRUE(waitUntil([&process] { return !isAlive(process); }, seconds(1)));
+    }
+
+    /// Whether the service serves under a supervisor, and both are others than these.
+    static bool isRestored(const std::string& service, const ServiceState& former) {
+        const ServiceState now = serviceState(service);
+        return isServing(now) && isAlive(now.supervisor) && !(now.supervisor == former.supervisor) &&
+               !(now.daemon == former.daemon);
+    }
+};
+
+TEST_F(ServiceWatchTest, AKilledSupervisorIsReplacedWithinTwoSeconds) {
+    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    for (const char* service : {"ftpd", "sftp"}) {
+        const ServiceState former = serviceState(service);
+        kill(former.supervisor);
+        EXPECT_TRUE(waitUntil([&] { return isRestored(service, former); }, seconds(2))) << service;
+        EXPECT_FALSE(isAlive(former.daemon)) << "no daemon of ours without a supervisor";
+    }
+    EXPECT_TRUE(accepts(ftpPort_));
+    EXPECT_TRUE(accepts(sftpPort_));
+    EXPECT_TRUE(waitUntil([] { return leftProcesses().size() == 4; }, seconds(2)))
+        << "two supervisors and their daemons remain, once the sessions of these connections have ended";
+}
+
+TEST_F(ServiceWatchTest, ADaemonThatDiesWithItsSupervisorIsUpAgainWithinTwoSeconds) {
+    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    const ServiceState former = serviceState("ftpd");
+    signalProcess(former.supervisor, SIGKILL);
+    signalProcess(former.daemon, SIGKILL);
+    EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(2)));
+    EXPECT_TRUE(accepts(ftpPort_));
+}
+
+TEST_F(ServiceWatchTest, TheNewDaemonTakesTheStoredSettings) {
+    const ServiceState former = serviceState("ftpd");
+    const int formerPort = ftpPort_;
+    ftpPort_ = freePort();
+    storeFtp(plain);
+    kill(former.supervisor);
+    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(2)));
+    EXPECT_TRUE(accepts(ftpPort_));
+    EXPECT_FALSE(accepts(formerPort));
+}
+
+TEST_F(ServiceWatchTest, WhatIsSwitchedOffByNowIsEnded) {
+    const ServiceState former = serviceState("sftp");
+    storeSftp(false);
+    kill(former.supervisor);
+    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(former.daemon); }, seconds(2)));
+    EXPECT_TRUE(waitUntil([] { return serviceState("sftp").state == RunState::stopped; }, milliseconds(500)));
+}
+
+TEST_F(ServiceWatchTest, AFailedStartIsTriedAgain) {
+    const ServiceState former = serviceState("ftpd");
+    kill(former.supervisor);
+    kill(former.daemon);
+    std::optional<Listener> other(ftpPort_);
+    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    EXPECT_TRUE(waitUntil([] { return servicesDown().size() == 1; }, seconds(2)));
+    EXPECT_TRUE(waitUntil(
+        [] {
+            const auto down = servicesDown();
+            return down.size() == 1 && down[0].reason.find("is in use by") != std::string::npos;
+        },
+        seconds(2)));
+    other.reset();
+    EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(4)));
+}
+
+TEST_F(ServiceWatchTest, WhatWasStoppedPausedOrRefusedIsLeftAlone) {
+    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
+    kill(serviceState("sftp").supervisor);
+    std::this_thread::sleep_for(milliseconds(1200));
+    EXPECT_FALSE(accepts(ftpPort_));
+    EXPECT_FALSE(accepts(sftpPort_));
+    EXPECT_EQ(serviceState("sftp").state, RunState::paused);
+    unwatchServices();
+    planDouble().ftpOptions = {"--refuse", "not today"};
+    EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
+    planDouble().ftpOptions = {};
+    ASSERT_EQ(watchServices(), 0);
+    std::this_thread::sleep_for(milliseconds(1200));
+    EXPECT_FALSE(accepts(ftpPort_)) << "whoever asked for the start has heard of its failure";
+}
+
+TEST_F(ServiceWatchTest, EndsAtOnceAndCanBeTakenUpAgain) {
+    ASSERT_EQ(watchServices(), 0);
+    ASSERT_EQ(watchServices(), 0) << "a second call is no second watch";
+    const auto began = std::chrono::steady_clock::now();
+    unwatchServices();
+    unwatchServices();
+    EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(400));
+    const ServiceState former = serviceState("ftpd");
+    kill(former.supervisor);
+    std::this_thread::sleep_for(milliseconds(800));
+    EXPECT_TRUE(isAlive(former.daemon)) << "nobody watches";
+    ASSERT_EQ(watchServices(), 0);
+    EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(2)));
+}
+
+} // namespace
+} // namespace velt::test

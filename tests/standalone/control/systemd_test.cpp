@@ -1,0 +1,211 @@
+// The units for systemd as text, and the conversation with systemctl. The program that answers here is a
+// stand-in, which starts and ends real supervisors.
+
+#include "standalone/control/supervise_backend.h"
+#include "standalone/control/systemd_launcher.h"
+#include "standalone/control/systemd_unit.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/installed_files.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/process/run_program.h"
+#include "tests/standalone/supervise/daemon_test.h"
+
+#include <csignal>
+#include <fstream>
+#include <memory>
+#include <sstream>
+
+namespace velt::test {
+namespace {
+
+using std::chrono::milliseconds;
+using std::chrono::seconds;
+
+class SystemdTest : public DaemonTest {
+protected:
+    void SetUp() override {
+        DaemonTest::SetUp();
+        places_.systemctl = (root_ / "systemctl").string();
+        places_.units = root_ / "units";
+        answerWith(systemctlScript());
+        backend_ =
+            std::make_unique<SuperviseBackend>("sftp", std::make_unique<SystemdLauncher>("sftp", places_));
+    }
+
+    void TearDown() override {
+        EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+        DaemonTest::TearDown();
+    }
+
+    /// Writes down what it is asked. A restart runs the supervisor, and ends when the state file tells that
+    /// the daemon serves or does not; a supervisor that fails leaves its reason there.
+    std::string systemctlScript() const {
+        return "cd " + root_.string() + "\necho \"$*\" >> calls\nstate=run/velt/sftp.state\n" +
+               R"(end() { [ -e pid ] && kill $(cat pid) 2>/dev/null; }
+case "$1" in
+restart)
+    end
+    )" + installedFile("velt-supervise").string() +
+               " " + (root_ / "run/velt").string() + R"( sftp >/dev/null 2>&1 &
+    echo $! > pid
+    while kill -0 $! 2>/dev/null; do
+        grep -q "^supervisor $! " $state && grep -q "^state running" $state && exit 0
+        sleep 0.01
+    done
+    exit 1 ;;
+stop) end; exit 0 ;;
+show) sed -n 's/^reason //p' $state ;;
+esac
+)";
+    }
+
+    void answerWith(const std::string& script) const {
+        std::ofstream(places_.systemctl) << "#!/bin/sh\n" << script;
+        std::filesystem::permissions(places_.systemctl, std::filesystem::perms::owner_all);
+    }
+
+    std::string calls() const { return readFile(root_ / "calls").value_or(""); }
+    void forgetCalls() const { std::filesystem::remove(root_ / "calls"); }
+
+    void start(const std::string& hash) {
+        ASSERT_EQ(backend_->start(testPlan(port_, hash)), 0) << lastErrorSentence();
+    }
+
+    void killSupervisor() {
+        const ProcessId supervisor = backend_->state().supervisor;
+        signalProcess(supervisor, SIGKILL);
+        ASSERT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, seconds(1)));
+    }
+
+    int port_ = freePort();
+    SystemdPlaces places_;
+    std::unique_ptr<SuperviseBackend> backend_;
+};
+
+TEST_F(SystemdTest, TheUnitRunsTheSupervisor) {
+    EXPECT_EQ(renderUnit("sftp", "/run/velt"), R"([Unit]
+Description=VELT SFTP server
+After=network.target
+StartLimitIntervalSec=0
+
+[Service]
+Type=notify
+ExecStart=")" + installedFile("velt-supervise").string() +
+                                                   R"(" "/run/velt" "sftp"
+Restart=on-abnormal
+RestartSec=100ms
+KillMode=process
+TimeoutStartSec=10s
+TimeoutStopSec=5s
+OOMPolicy=continue
+)");
+    EXPECT_EQ(unitName("ftpd"), "velt-ftpd.service");
+}
+
+TEST(SystemdUnit, QuotesWhatHasAMeaningOfItsOwn) {
+    EXPECT_EQ(quoteUnitWord("a b"), "\"a b\"");
+    EXPECT_EQ(quoteUnitWord(R"(a"b\c)"), R"("a\"b\\c")");
+    EXPECT_EQ(quoteUnitWord("%h $HOME"), "\"%%h $$HOME\"");
+    EXPECT_EQ(quoteUnitWord("a\nExecStart=/bin/x"), "\"a\\x0aExecStart=/bin/x\"");
+    EXPECT_EQ(quoteUnitWord(""), "\"\"");
+    EXPECT_EQ(quoteUnitWord("gr\xc3\xbc\xc3\x9f"), "\"gr\xc3\xbc\xc3\x9f\"");
+}
+
+TEST_F(SystemdTest, AStartWritesTheUnitAndReturnsWhenTheDaemonListens) {
+    start("one");
+    EXPECT_TRUE(accepts(port_));
+    EXPECT_EQ(readFile(places_.units / "velt-sftp.service"), renderUnit("sftp", statePath("/run/velt")));
+    EXPECT_TRUE(isServing(backend_->state()));
+    EXPECT_EQ(calls(), "daemon-reload\nrestart velt-sftp.service\n");
+    forgetCalls();
+    start("one");
+    EXPECT_EQ(calls(), "") << "nothing changed";
+    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_EQ(calls(), "stop velt-sftp.service\nreset-failed velt-sftp.service\n");
+    EXPECT_EQ(backend_->state().state, RunState::stopped);
+    forgetCalls();
+    start("two");
+    EXPECT_EQ(calls(), "restart velt-sftp.service\n") << "the unit is as it was";
+}
+
+TEST_F(SystemdTest, TheStockServersStopLeavesTheFolderThatEachConnectionNeeds) {
+    start("one");
+    EXPECT_EQ(readFile(places_.units / "ssh.service.d/velt-sftp.conf"),
+              "[Service]\nRuntimeDirectoryPreserve=yes\n");
+    SuperviseBackend ftp("ftpd", std::make_unique<SystemdLauncher>("ftpd", places_));
+    std::filesystem::remove_all(places_.units / "ssh.service.d");
+    EXPECT_LT(ftp.start(testPlan(freePort(), "one", {"--refuse", "no"})), 0);
+    EXPECT_FALSE(std::filesystem::exists(places_.units / "ssh.service.d")) << "FTP does not need it";
+}
+
+TEST_F(SystemdTest, SessionsThatWereMovedOutOfTheUnitOutliveAPauseAndEndWithAStop) {
+    start("one");
+    Client client(port_); // no control group tells whose session this is
+    ASSERT_TRUE(client.isServed());
+    ASSERT_EQ(backend_->pause(), 0) << lastErrorSentence();
+    EXPECT_FALSE(accepts(port_));
+    EXPECT_TRUE(client.isServed());
+    ASSERT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_FALSE(client.isServed());
+}
+
+TEST_F(SystemdTest, AKilledSupervisorComesBackWithTheSettingsThatWereTakenUpLast) {
+    start("one");
+    const int former = port_;
+    port_ = freePort();
+    start("two");
+    killSupervisor();
+    ASSERT_EQ(runProcess({places_.systemctl, "restart", "velt-sftp.service"}).exitCode, 0);
+    EXPECT_TRUE(accepts(port_));
+    EXPECT_FALSE(accepts(former));
+    EXPECT_EQ(backend_->state().configurationHash, "two");
+}
+
+TEST_F(SystemdTest, AStopOfAKilledSupervisorIsToldToSystemd) {
+    start("one");
+    killSupervisor();
+    forgetCalls();
+    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_TRUE(calls().starts_with("stop velt-sftp.service\n")) << "or the daemon would come back";
+    EXPECT_FALSE(accepts(port_));
+}
+
+TEST_F(SystemdTest, AFailedStartGivesTheDaemonsWords) {
+    EXPECT_LT(backend_->start(testPlan(port_, "one", {"--refuse", "fatal: no such certificate"})), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: fatal: no such certificate.");
+}
+
+TEST_F(SystemdTest, SystemdsOwnRefusalIsNamed) {
+    answerWith("[ $1 = restart ] || exit 0\necho 'Failed to restart: Unit is masked.' >&2; exit 1\n");
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: Failed to restart: Unit is masked.");
+    answerWith("[ $1 = daemon-reload ] && exit 3\nexit 0\n");
+    std::filesystem::remove(places_.units / "velt-sftp.service");
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: systemctl ended with status 3.");
+}
+
+TEST_F(SystemdTest, AnAnswerIsNotTakenForADaemon) {
+    answerWith("exit 0\n"); // as in a changed root, where systemctl ignores all requests
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_EQ(lastErrorSentence(),
+              "The SFTP daemon does not start: systemd says that it has started it, but it does not serve.");
+}
+
+TEST_F(SystemdTest, AStartIsOverWithinFiveSeconds) {
+    answerWith("[ $1 = restart ] && exec sleep 20\nexit 0\n");
+    const auto began = std::chrono::steady_clock::now();
+    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(5500));
+    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: its supervisor does not report in time.");
+}
+
+TEST_F(SystemdTest, WhatWasNeverStartedIsStoppedWithoutACall) {
+    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_EQ(backend_->pause(), 0) << lastErrorSentence();
+    EXPECT_EQ(calls(), "");
+}
+
+} // namespace
+} // namespace velt::test

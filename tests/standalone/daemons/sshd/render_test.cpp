@@ -1,0 +1,91 @@
+#include "standalone/core/effects.h"
+#include "standalone/core/last_error.h"
+#include "standalone/core/state_root.h"
+#include "standalone/daemons/candidate.h"
+#include "standalone/daemons/sshd/host_keys.h"
+#include "standalone/daemons/sshd/render.h"
+#include "tests/standalone/support/golden.h"
+#include "tests/standalone/support/temporary_folder.h"
+
+#include <sys/stat.h>
+
+#include <thread>
+
+namespace velt::test {
+namespace {
+
+const SshdPlaces examplePlaces{{"/var/lib/velt/ssh/host_ed25519_key", "/var/lib/velt/ssh/host_rsa_key"},
+                               true};
+
+TEST(SshdRendering, isAsRecorded) {
+    expectGolden(GOLDEN_FOLDER "/sftp.conf", renderSshd({true, 2222}, examplePlaces));
+}
+
+TEST(SshdRendering, isAsRecordedWithoutRootsRights) {
+    SshdPlaces places = examplePlaces;
+    places.privileged = false;
+    expectGolden(GOLDEN_FOLDER "/sftp_unprivileged.conf", renderSshd({true, 2222}, places));
+}
+
+TEST(SshdRendering, isAsRecordedForTheLoopbackOnly) {
+    SshdPlaces places = examplePlaces;
+    places.loopbackOnly = true;
+    expectGolden(GOLDEN_FOLDER "/sftp_loopback.conf", renderSshd({true, 2222}, places));
+}
+
+class SftpCandidate : public testing::Test {
+protected:
+    void SetUp() override {
+        if (!std::filesystem::exists("/usr/sbin/sshd")) {
+            GTEST_SKIP() << "the OpenSSH server is not installed";
+        }
+        setStateRoot(root_.path());
+    }
+    void TearDown() override { setStateRoot("/"); }
+
+    TemporaryFolder root_;
+};
+
+TEST_F(SftpCandidate, isTakenAndLeavesNothingButTheKeys) {
+    EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
+    EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
+}
+
+TEST_F(SftpCandidate, isRefusedInTheDaemonsOwnWords) {
+    EXPECT_LT(testSftpCandidate({true, 65536}), 0);
+    EXPECT_NE(lastErrorSentence().find("Badly formatted port number"), std::string::npos)
+        << lastErrorSentence();
+}
+
+TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
+    std::vector<std::string> effects;
+    std::thread([&] {
+        setEffectHook([&](Effect effect, std::string_view subject) {
+            effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
+            return EffectDecision{false, 0};
+        });
+        EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
+        EXPECT_LT(testSftpCandidate({true, 65536}), 0);
+    }).join();
+    EXPECT_EQ(effects, (std::vector<std::string>{"store host keys", "store host keys"}));
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/ssh"));
+    EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
+}
+
+TEST_F(SftpCandidate, keepsItsKeys) {
+    const auto keys = hostKeys();
+    ASSERT_TRUE(keys) << lastErrorSentence();
+    ASSERT_EQ(keys->size(), 2U);
+    const std::string first = root_.read("var/lib/velt/ssh/host_ed25519_key");
+    EXPECT_NE(first, "");
+    for (const auto& key : *keys) {
+        struct stat facts {};
+        ASSERT_EQ(stat(key.c_str(), &facts), 0);
+        EXPECT_EQ(facts.st_mode & 07777, 0600U);
+    }
+    ASSERT_TRUE(hostKeys());
+    EXPECT_EQ(root_.read("var/lib/velt/ssh/host_ed25519_key"), first);
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,209 @@
+#include "tests/standalone/login/login_root.h"
+
+#include "conf.h"
+#include "privs.h"
+
+extern module velt_chroot_module;
+
+session_t session;
+server_rec* main_server = NULL;
+
+typedef void (*listener)(const void*, void*);
+
+static const struct login_world* world;
+static listener on_code;
+static listener on_root;
+static int ended;
+static char log_text[2048];
+static char memory[65536];
+static size_t used;
+
+static void* take(size_t size) {
+    size_t start = (used + 15) & ~(size_t)15;
+    if (start + size > sizeof(memory)) {
+        abort();
+    }
+    used = start + size;
+    return memory + start;
+}
+
+pool* make_sub_pool(pool* parent) {
+    return parent;
+}
+
+void destroy_pool(pool* p) {
+    (void)p;
+}
+
+void* pcalloc(pool* p, size_t size) {
+    (void)p;
+    return memset(take(size), 0, size);
+}
+
+char* pstrdup(pool* p, const char* text) {
+    (void)p;
+    return strcpy(take(strlen(text) + 1), text);
+}
+
+char* pstrcat(pool* p, ...) {
+    char joined[8192] = "";
+    va_list parts;
+    va_start(parts, p);
+    for (const char* part = NULL; (part = va_arg(parts, const char*)) != NULL;) {
+        (void)strncat(joined, part, sizeof(joined) - strlen(joined) - 1);
+    }
+    va_end(parts);
+    return pstrdup(p, joined);
+}
+
+const char* pr_uid2str(pool* p, uid_t uid) {
+    char text[16];
+    (void)snprintf(text, sizeof(text), "%lu", (unsigned long)uid);
+    return pstrdup(p, text);
+}
+
+const char* pr_gid2str(pool* p, gid_t gid) {
+    return pr_uid2str(p, (uid_t)gid);
+}
+
+struct passwd* pr_auth_getpwnam(pool* p, const char* name) {
+    static struct passwd account;
+    static char home[] = "/home/alice";
+    (void)p;
+    account.pw_name = (char*)name;
+    account.pw_dir = home;
+    account.pw_uid = 1001;
+    account.pw_gid = 1001;
+    return world->knows_user ? &account : NULL;
+}
+
+int pr_auth_getgroups(pool* p, const char* name, array_header** ids, array_header** names) {
+    static gid_t groups[2] = {1001, 2001};
+    static array_header known;
+    (void)p;
+    (void)name;
+    (void)names;
+    known.elts = groups;
+    known.nelts = world->knows_groups ? 2 : 0;
+    *ids = &known;
+    return world->knows_groups ? 2 : -1;
+}
+
+config_rec* find_config(xaset_t* set, int type, const char* name, int recurse) {
+    static void* arguments[3];
+    static config_rec found;
+    (void)set;
+    (void)type;
+    (void)recurse;
+    arguments[0] = (void*)world->program;
+    arguments[1] = (void*)world->state_root;
+    /* The kind for which the program runs in the namespaces of the test itself. */
+    arguments[2] = "server";
+    found.argc = 3;
+    found.argv = arguments;
+    return strcmp(name, "VeltLoginRoot") == 0 && world->program[0] != '\0' ? &found : NULL;
+}
+
+config_rec* add_config_param_str(const char* name, unsigned int count, ...) {
+    (void)name;
+    (void)count;
+    return NULL;
+}
+
+modret_t* mod_create_ret(cmd_rec* cmd, unsigned char code, const char* number, const char* text) {
+    (void)cmd;
+    (void)code;
+    (void)number;
+    (void)text;
+    return NULL;
+}
+
+unsigned char check_context(cmd_rec* cmd, int contexts) {
+    (void)cmd;
+    (void)contexts;
+    return TRUE;
+}
+
+char* get_context_name(cmd_rec* cmd) {
+    static char none[] = "";
+    (void)cmd;
+    return none;
+}
+
+void pr_log_pri(int priority, const char* format, ...) {
+    va_list parts;
+    (void)priority;
+    va_start(parts, format);
+    (void)vsnprintf(log_text, sizeof(log_text), format, parts);
+    va_end(parts);
+}
+
+int pr_privs_root(const char* file, int line) {
+    (void)file;
+    (void)line;
+    return 0;
+}
+
+int pr_privs_relinquish(const char* file, int line) {
+    (void)file;
+    (void)line;
+    return 0;
+}
+
+int pr_event_register(module* m, const char* event, listener told, void* data) {
+    (void)m;
+    (void)data;
+    if (strcmp(event, "mod_auth.authentication-code") == 0) {
+        on_code = told;
+    } else if (strcmp(event, "core.chroot") == 0) {
+        on_root = told;
+    }
+    return 0;
+}
+
+void pr_response_send(const char* code, const char* format, ...) {
+    (void)format;
+    ended = strcmp(code, R_530) == 0;
+}
+
+void pr_session_end(int flags) {
+    (void)flags;
+}
+
+static void begin(const struct login_world* login) {
+    static server_rec server;
+
+    main_server = &server;
+    world = login;
+    used = 0;
+    ended = FALSE;
+    log_text[0] = '\0';
+    session.user = "alice";
+    (void)velt_chroot_module.sess_init();
+}
+
+enum login_end log_in(const struct login_world* login) {
+    begin(login);
+    int code = login->code;
+    on_code(&code, NULL);
+    if (code < 0) {
+        return login_wrong;
+    }
+    on_root("/root", NULL);
+    return ended ? login_disconnected : login_granted;
+}
+
+enum login_end change_root_unasked(const struct login_world* login) {
+    struct login_world wrong = *login;
+
+    /* What an earlier login may have left is gone with a refused one. */
+    wrong.knows_user = FALSE;
+    (void)log_in(&wrong);
+    begin(login);
+    on_root("/root", NULL);
+    return ended ? login_disconnected : login_granted;
+}
+
+const char* logged(void) {
+    return log_text;
+}

@@ -1,0 +1,28 @@
+/* Lets the FTP daemon's module decide on a login, with a stand-in for the daemon around it. */
+#ifndef VELT_TESTS_STANDALONE_LOGIN_LOGIN_ROOT_H
+#define VELT_TESTS_STANDALONE_LOGIN_LOGIN_ROOT_H
+
+struct login_world {
+    const char* program;    /* "": no VeltLoginRoot in the configuration */
+    const char* state_root; /* handed to the program */
+    int knows_user;
+    int knows_groups;
+    int code; /* what the daemon says of the password; negative: wrong */
+};
+
+enum login_end {
+    login_granted,
+    login_wrong,        /* as a wrong password */
+    login_disconnected, /* at the change of the root directory */
+};
+
+/* How the login of "alice" (1001, groups 1001 and 2001) ends. */
+enum login_end log_in(const struct login_world* world);
+
+/* How it ends when the root directory changes although nobody was told of a password. */
+enum login_end change_root_unasked(const struct login_world* world);
+
+/* What the module wrote to the log in the last call; "" when nothing. */
+const char* logged(void);
+
+#endif

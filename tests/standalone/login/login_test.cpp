@@ -1,0 +1,107 @@
+// The FTP daemon's module at a login, where the daemon or the program that makes the view cannot do their
+// part.
+#include "tests/standalone/support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <sys/stat.h>
+
+extern "C" {
+#include "standalone/login/helper.h"
+#include "tests/standalone/login/login_root.h"
+}
+
+#include <array>
+#include <chrono>
+
+namespace velt::test {
+namespace {
+
+class LoginModule : public testing::Test {
+protected:
+    std::string script(const std::string& text) {
+        const auto file = folder_.write("program", "#!/bin/sh\n" + text);
+        chmod(file.c_str(), 0755);
+        return file.string();
+    }
+    login_end logIn(const std::string& program, bool knowsUser = true, bool knowsGroups = true,
+                    int code = 0) {
+        const login_world world{program.c_str(), folder_.path().c_str(), knowsUser, knowsGroups, code};
+        return log_in(&world);
+    }
+
+    TemporaryFolder folder_;
+};
+
+TEST_F(LoginModule, handsWhatTheDaemonKnowsToTheProgram) {
+    EXPECT_EQ(logIn(script("printf '%s\\n' \"$@\" > \"$1/told\"; env > \"$1/environment\"\n")),
+              login_granted);
+    EXPECT_EQ(folder_.read("told"),
+              folder_.path().string() + "\nserver\n/\nalice\n1001\n1001,1001,2001\n/home/alice\n");
+    EXPECT_EQ(folder_.read("environment").find("HOME="), std::string::npos);
+    EXPECT_STREQ(logged(), "");
+}
+
+TEST_F(LoginModule, logsWhatTheProgramRemarks) {
+    EXPECT_EQ(logIn(script("echo 'a share is left out' >&2\n")), login_granted);
+    EXPECT_NE(std::string(logged()).find("login of 'alice': a share is left out"), std::string::npos);
+}
+
+TEST_F(LoginModule, takesARefusalForAWrongPassword) {
+    EXPECT_EQ(logIn(script("printf 'no\\tsuch\\nfolder\\n' >&2; exit 1\n")), login_wrong);
+    EXPECT_NE(std::string(logged()).find("login of 'alice' refused: no such folder"), std::string::npos)
+        << logged();
+    EXPECT_EQ(logIn(script("kill -KILL $$\n")), login_wrong);
+    EXPECT_EQ(logIn((folder_.path() / "absent").string()), login_wrong);
+    EXPECT_EQ(logIn(""), login_wrong) << "nothing configured";
+}
+
+TEST_F(LoginModule, refusesWhomTheDaemonCannotTell) {
+    const auto program = script("exit 0\n");
+    EXPECT_EQ(logIn(program, true, true), login_granted);
+    EXPECT_EQ(logIn(program, true, false), login_wrong);
+    EXPECT_EQ(logIn(program, false, true), login_wrong);
+}
+
+TEST_F(LoginModule, doesNothingForAWrongPassword) {
+    EXPECT_EQ(logIn(script("touch \"$1/ran\"\n"), true, true, -1), login_wrong);
+    EXPECT_FALSE(std::filesystem::exists(folder_.path() / "ran"));
+}
+
+TEST_F(LoginModule, endsASessionThatChangesItsRootWithoutIt) {
+    const auto program = script("exit 0\n");
+    const login_world world{program.c_str(), folder_.path().c_str(), 1, 1, 0};
+    EXPECT_EQ(change_root_unasked(&world), login_disconnected);
+}
+
+TEST_F(LoginModule, waitsForAProgramNoLongerThanItSays) {
+    const auto program = script("exec sleep 30\n");
+    std::array<char*, 2> arguments{const_cast<char*>(program.c_str()), nullptr};
+    std::array<char, 64> words{};
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EQ(velt_helper_run(arguments.data(), 1, words.data(), words.size()), 0);
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
+    EXPECT_STREQ(words.data(), "it takes too long");
+}
+
+TEST_F(LoginModule, cutsLongWords) {
+    const auto program =
+        script("i=0; while [ $i -lt 2000 ]; do echo 0123456789012345 >&2; i=$((i+1)); done; exit 1\n");
+    std::array<char*, 2> arguments{const_cast<char*>(program.c_str()), nullptr};
+    std::array<char, 20> words{};
+    words.fill('x');
+    EXPECT_EQ(velt_helper_run(arguments.data(), 10, words.data(), words.size()), 0);
+    EXPECT_STREQ(words.data(), "0123456789012345 01");
+}
+
+TEST_F(LoginModule, leavesNoDescriptorBehind) {
+    const auto count = [] { return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {}); };
+    const auto before = count();
+    logIn(script("exit 0\n"));
+    logIn(script("exit 1\n"));
+    logIn((folder_.path() / "absent").string());
+    EXPECT_EQ(count(), before);
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,92 @@
+#include "standalone/login/open_folder.h"
+
+#include "tests/standalone/support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class OpenFolder : public testing::Test {
+protected:
+    void SetUp() override {
+        if (geteuid() != 0) {
+            GTEST_SKIP() << "only root can take another account's identity";
+        }
+        chmod(root_.path().c_str(), 0755);
+        fs::create_directories(share_ / "below/deep");
+        fs::create_directories(root_.path() / "outside");
+        login_.uid = 54321;
+        login_.gids = {54322, 54323};
+    }
+    std::string below(const fs::path& path) {
+        const UniqueFd share = openFolder(share_);
+        const UniqueFd folder = openFolderBelow(login_, share, path);
+        return folder ? placeOf(folder).lexically_relative(share_) : fs::path("(refused)");
+    }
+
+    TemporaryFolder root_;
+    const fs::path share_ = fs::canonical(root_.path()) / "share";
+    Login login_;
+};
+
+TEST_F(OpenFolder, belowLeadsToFoldersInIt) {
+    EXPECT_EQ(below("below/deep"), "below/deep");
+    fs::create_directory_symlink("below", share_ / "alias");
+    EXPECT_EQ(below("alias/deep"), "below/deep");
+    EXPECT_EQ(below("absent"), "(refused)");
+    root_.write("share/file", "");
+    EXPECT_EQ(below("file"), "(refused)");
+}
+
+TEST_F(OpenFolder, belowNeverLeadsOut) {
+    fs::create_directory_symlink("../outside", share_ / "up");
+    fs::create_directory_symlink(root_.path() / "outside", share_ / "away");
+    fs::create_directory_symlink(share_ / "below", share_ / "absolute");
+    for (const char* path : {"up", "away", "absolute", "..", "below/../../outside", "/", "/etc"}) {
+        EXPECT_EQ(below(path), "(refused)") << path;
+    }
+}
+
+TEST_F(OpenFolder, belowHasTheRightsOfTheLogin) {
+    fs::permissions(share_ / "below", fs::perms(0700));
+    EXPECT_EQ(below("below/deep"), "(refused)");
+    ASSERT_EQ(chown((share_ / "below").c_str(), 0, 54323), 0);
+    fs::permissions(share_ / "below", fs::perms(0710));
+    EXPECT_EQ(below("below/deep"), "below/deep");
+    ASSERT_EQ(chown((share_ / "below").c_str(), 54321, 0), 0);
+    fs::permissions(share_ / "below", fs::perms(0700));
+    EXPECT_EQ(below("below/deep"), "below/deep");
+    EXPECT_TRUE(openFolderAs(login_, share_ / "below/deep"));
+    login_.uid = 54324;
+    EXPECT_FALSE(openFolderAs(login_, share_ / "below/deep"));
+    EXPECT_TRUE(openFolder(share_ / "below/deep")) << "root's rights are back";
+    EXPECT_EQ(getgroups(0, nullptr), 0);
+}
+
+TEST_F(OpenFolder, exactlyFollowsNoLinks) {
+    fs::create_directory_symlink("below", share_ / "alias");
+    const UniqueFd share = openFolder(share_);
+    EXPECT_TRUE(openFolderExactly(share, "below/deep"));
+    EXPECT_FALSE(openFolderExactly(share, "alias/deep"));
+    EXPECT_FALSE(openFolderExactly(share, ".."));
+}
+
+TEST_F(OpenFolder, theRemovedHasNoPlace) {
+    const UniqueFd folder = openFolder(share_ / "below/deep");
+    EXPECT_EQ(placeOf(folder), share_ / "below/deep");
+    fs::remove(share_ / "below/deep");
+    EXPECT_EQ(placeOf(folder), "");
+    fs::create_directory(share_ / "below/deep (deleted)");
+    EXPECT_EQ(placeOf(folder), "") << "another folder of that name";
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,130 @@
+// Reading the kernel's tables, and opening ports on trial.
+
+#include "standalone/core/last_error.h"
+#include "standalone/ports/known_services.h"
+#include "standalone/ports/port_probe.h"
+#include "standalone/ports/port_range.h"
+#include "standalone/process/listening_sockets.h"
+#include "tests/standalone/supervise/daemon_test.h"
+
+#include <netinet/in.h>
+#include <sys/prctl.h>
+#include <sys/socket.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
+
+namespace velt::test {
+namespace {
+
+TEST(ListeningSockets, AreFoundForIPv4AndIPv6) {
+    const int port = freePort();
+    EXPECT_FALSE(listensOn(::getpid(), port));
+    {
+        const Listener listener(port);
+        EXPECT_TRUE(listensOn(::getpid(), port));
+        EXPECT_FALSE(listensOn(::getppid(), port)) << "another process listens";
+    }
+    EXPECT_FALSE(listensOn(::getpid(), port));
+
+    const int six = ::socket(AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_in6 address{};
+    address.sin6_family = AF_INET6;
+    address.sin6_port = htons(static_cast<in_port_t>(port));
+    if (six < 0 || ::bind(six, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) {
+        ::close(six);
+        GTEST_SKIP() << "no IPv6 here";
+    }
+    EXPECT_FALSE(listensOn(::getpid(), port)) << "bound is not listening";
+    ASSERT_EQ(::listen(six, 1), 0);
+    EXPECT_TRUE(listensOn(::getpid(), port));
+    ::close(six);
+}
+
+// Starts a process that listens and hides it, as daemons do that have changed their rights, and asks as the
+// same user. The exit code says what was seen of it: 1 for its port, 2 for another.
+int seenByItsOwnUser(int port, int otherPort) {
+    constexpr uid_t stranger = 65534;
+    if (::geteuid() == 0 && ::setresuid(stranger, stranger, stranger) != 0) {
+        return -1;
+    }
+    std::array<int, 2> ready{};
+    std::array<int, 2> end{};
+    if (::pipe(ready.data()) != 0 || ::pipe(end.data()) != 0) {
+        return -1;
+    }
+    const pid_t daemon = ::fork();
+    char byte = 0;
+    if (daemon == 0) {
+        ::close(end[1]);
+        const Listener listener(port);
+        const bool hidden = ::prctl(PR_SET_DUMPABLE, 0) == 0;
+        ::_exit(hidden && ::write(ready[1], "x", 1) == 1 && ::read(end[0], &byte, 1) == 0 ? 0 : 1);
+    }
+    const bool isReady = ::read(ready[0], &byte, 1) == 1;
+    const int seen = (listensOn(daemon, port) ? 1 : 0) + (listensOn(daemon, otherPort) ? 2 : 0);
+    ::close(end[1]);
+    ::waitpid(daemon, nullptr, 0);
+    return isReady ? seen : -1;
+}
+
+TEST(ListeningSockets, AreFoundOfAProcessThatHidesThem) {
+    const int port = freePort();
+    const int otherPort = freePort();
+    const pid_t asker = ::fork();
+    if (asker == 0) {
+        ::_exit(seenByItsOwnUser(port, otherPort));
+    }
+    int status = 0;
+    ASSERT_EQ(::waitpid(asker, &status, 0), asker);
+    ASSERT_TRUE(WIFEXITED(status));
+    EXPECT_EQ(WEXITSTATUS(status), 1);
+}
+
+TEST(ListeningSockets, HaveAnOwner) {
+    const int port = freePort();
+    const Listener listener(port);
+    EXPECT_EQ(describeListener(port), "standalone_port (process " + std::to_string(::getpid()) + ")");
+    EXPECT_EQ(describeListener(freePort()), "another program");
+}
+
+TEST(PortProbe, TakesFreePortsAndLeavesThemFree) {
+    const std::vector<int> ports{freePort(), freePort()};
+    EXPECT_EQ(probePorts(ports), 0) << lastErrorSentence();
+    EXPECT_EQ(probePorts(ports), 0) << lastErrorSentence();
+    const Listener listener(ports[1]);
+}
+
+TEST(PortProbe, NamesTheHolderUnlessItIsTheOneThatAsks) {
+    const int port = freePort();
+    const Listener listener(port);
+    EXPECT_LT(probePorts({freePort(), port}), 0);
+    EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) +
+                                       " is in use by standalone_port (process " +
+                                       std::to_string(::getpid()) + ").");
+    EXPECT_EQ(probePorts({port}, ::getpid()), 0);
+}
+
+TEST(PortRange, IsReadStrictly) {
+    const auto range = parsePortRange("8000-8010");
+    ASSERT_TRUE(range);
+    EXPECT_EQ(range->first, 8000);
+    EXPECT_EQ(range->last, 8010);
+    EXPECT_EQ(formatPortRange(*range), "8000-8010");
+    EXPECT_EQ(formatPortRange(*parsePortRange("65535")), "65535");
+    for (const char* text :
+         {"", "-", "0", "65536", "80x", " 80", "80 ", "+80", "80-", "-80", "90-80", "1-2-3", "99999999999"}) {
+        EXPECT_FALSE(parsePortRange(text)) << text;
+    }
+}
+
+TEST(KnownServices, ThatAreShippedCanBeRead) {
+    const auto services = parseKnownServices(shippedKnownServices, "shipped");
+    ASSERT_TRUE(services) << lastErrorSentence();
+    EXPECT_GT(services->size(), 20U);
+    EXPECT_EQ(services->front(), (KnownService{22, 22, "ssh"}));
+}
+
+} // namespace
+} // namespace velt::test
