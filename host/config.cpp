@@ -1,7 +1,7 @@
 #include "host/config.h"
 
-#include "host/file_text.h"
-#include "host/json_text.h"
+#include "host/base/file_text.h"
+#include "host/base/json.h"
 
 #include <algorithm>
 #include <cerrno>

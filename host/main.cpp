@@ -1,13 +1,13 @@
 // veltd: loads the modules over the platform and serves them.
 
-#include "host/app.h"
+#include "host/api/app.h"
+#include "host/base/host_log.h"
+#include "host/base/json.h"
+#include "host/base/open_file_limit.h"
 #include "host/config.h"
-#include "host/descriptors.h"
-#include "host/host_log.h"
 #include "host/http/server.h"
-#include "host/json_text.h"
-#include "host/module_table.h"
-#include "host/platform_access.h"
+#include "host/module/module_table.h"
+#include "standalone/standalone.h"
 
 #include <csignal>
 #include <cstdio>
@@ -74,9 +74,8 @@ HttpLimits possibleLimits(const Config& config, HostLog& log) {
 }
 
 void serve(const Config& config, const sigset_t& signals, HostLog& log) {
-    std::string error;
-    if (!velt::host::openPlatform(config.stateRoot, error)) {
-        throw velt::host::ConfigError(error);
+    if (velt::openState(config.stateRoot) < 0) {
+        throw velt::host::ConfigError(velt::lastErrorSentence());
     }
     velt::host::ModuleTable table;
     for (const auto& module : config.modules) {
@@ -89,11 +88,11 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     App app(settings, table, log);
     HttpServer server(app, possibleLimits(config, log), config.tls);
     const Json::Value ready = listenEverywhere(config, server, log);
-    if (!velt::host::startEnabledServices(error)) {
-        log.write("not every enabled service started: " + error);
+    if (velt::startEnabledServices() < 0) {
+        log.write("not every enabled service started: " + velt::lastErrorSentence());
     }
-    if (!velt::host::watchServices(error)) {
-        log.write("nobody watches the services: " + error);
+    if (velt::watchServices() < 0) {
+        log.write("nothing watches the services: " + velt::lastErrorSentence());
     }
     server.start(config.ioThreads);
     if (config.printReady) {
@@ -105,7 +104,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     log.write("stopping");
     server.stop(config.stopTime);
     app.stop();
-    velt::host::unwatchServices();
+    velt::unwatchServices();
     log.write("stopped");
 }
 

@@ -1,6 +1,6 @@
 #include "host/http/listener.h"
 
-#include "host/accounts.h"
+#include "host/base/account_names.h"
 
 #include <arpa/inet.h>
 #include <fcntl.h>

@@ -1,7 +1,10 @@
 #include "host/http/response_text.h"
 
-#include "host/clock.h"
-#include "host/problem.h"
+#include "host/base/clock.h"
+
+#include <algorithm>
+#include <array>
+#include <utility>
 
 namespace velt::host {
 
@@ -26,6 +29,34 @@ std::string commonHead(int status) {
 }
 
 } // namespace
+
+const char* reasonPhrase(int status) {
+    static constexpr std::array<std::pair<int, const char*>, 20> phrases{{
+        {200, "OK"},
+        {201, "Created"},
+        {204, "No Content"},
+        {400, "Bad Request"},
+        {401, "Unauthorized"},
+        {403, "Forbidden"},
+        {404, "Not Found"},
+        {405, "Method Not Allowed"},
+        {408, "Request Timeout"},
+        {409, "Conflict"},
+        {412, "Precondition Failed"},
+        {413, "Content Too Large"},
+        {417, "Expectation Failed"},
+        {422, "Unprocessable Content"},
+        {431, "Request Header Fields Too Large"},
+        {500, "Internal Server Error"},
+        {501, "Not Implemented"},
+        {503, "Service Unavailable"},
+        {505, "HTTP Version Not Supported"},
+        {507, "Insufficient Storage"},
+    }};
+    const auto* const found = std::find_if(phrases.begin(), phrases.end(),
+                                           [status](const auto& each) { return each.first == status; });
+    return found == phrases.end() ? "Unknown" : found->second;
+}
 
 std::string responseText(const HttpResponse& response, bool keepAlive, bool withBody) {
     constexpr int noContent = 204;

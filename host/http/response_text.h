@@ -8,6 +8,9 @@
 
 namespace velt::host {
 
+/// The reason phrase of a status: "Not Found".
+const char* reasonPhrase(int status);
+
 /// Status line, headers and body in one text, so that they leave in one write. Without body for HEAD.
 std::string responseText(const HttpResponse& response, bool keepAlive, bool withBody);
 

@@ -1,8 +1,8 @@
 // The host's settings, its log, and the lines that modules write to the system log.
 
+#include "host/base/host_log.h"
 #include "host/config.h"
-#include "host/host_log.h"
-#include "host/module_log.h"
+#include "host/module/module_log.h"
 
 #include <gtest/gtest.h>
 #include <syslog.h>

@@ -3,9 +3,9 @@
 #ifndef VELT_TESTS_HOST_HOST_TEST_H
 #define VELT_TESTS_HOST_HOST_TEST_H
 
-#include "host/app.h"
+#include "host/api/app.h"
 #include "host/http/server.h"
-#include "host/module_table.h"
+#include "host/module/module_table.h"
 #include "tests/host/client.h"
 
 #include <gtest/gtest.h>

@@ -1,0 +1,123 @@
+#include "host/api/access.h"
+
+#include "host/api/problem.h"
+#include "host/base/account_names.h"
+#include "host/base/random_text.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <cctype>
+#include <utility>
+
+namespace velt::host {
+
+namespace {
+
+std::string lowered(std::string text) {
+    std::transform(text.begin(), text.end(), text.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    return text;
+}
+
+/// "[::1]:8080" is "::1" and "8080".
+std::pair<std::string, std::string> splitHost(const std::string& host) {
+    if (host.starts_with('[')) {
+        const std::size_t end = host.find(']');
+        if (end == std::string::npos) {
+            return {"", ""};
+        }
+        return {host.substr(1, end - 1), host.substr(std::min(host.size(), end + 2))};
+    }
+    const std::size_t colon = host.find(':');
+    return {host.substr(0, colon), colon == std::string::npos ? "" : host.substr(colon + 1)};
+}
+
+/// Whether a browser says that the request comes from a page of another origin.
+bool isForeignPage(const HttpRequest& head, const Peer& peer) {
+    if (!head.fetchSite.empty() && head.fetchSite != "same-origin" && head.fetchSite != "none") {
+        return true;
+    }
+    const std::string own = (peer.isTls ? "https://" : "http://") + lowered(head.host);
+    return !head.origin.empty() && lowered(head.origin) != own;
+}
+
+} // namespace
+
+Access::Access(AccessSettings settings, const TokenStore& tokens, HostLog& log)
+    : settings_(std::move(settings)), tokens_(tokens), log_(log) {}
+
+std::optional<Refusal> Access::check(const HttpRequest& head, const Peer& peer, Principal& principal) const {
+    if (auto refusal = authenticate(head, peer, principal)) {
+        return refusal;
+    }
+    if (!head.wellFormed) {
+        return std::nullopt;
+    }
+    if (!peer.isUnixSocket && !knowsHost(head.host, peer)) {
+        return refuse(403, "The Host header names \"" + head.host + "\", which is not this host.", peer,
+                      false);
+    }
+    if (isForeignPage(head, peer)) {
+        return refuse(403, "Requests from pages of another origin are not served.", peer, false);
+    }
+    return std::nullopt;
+}
+
+std::optional<Refusal> Access::authenticate(const HttpRequest& head, const Peer& peer,
+                                            Principal& principal) const {
+    principal.address = peer.address;
+    if (head.authorization.empty()) {
+        if (!peer.isUnixSocket) {
+            return refuse(401, "Send a token: \"Authorization: Bearer TOKEN\".", peer, false);
+        }
+        if (!isAdmin(peer)) {
+            return refuse(403,
+                          "The user " + userName(peer.uid) + " is neither root nor in the group " +
+                              settings_.adminGroup + ".",
+                          peer, true);
+        }
+        principal.role = Role::admin;
+        principal.actor = userName(peer.uid);
+        return std::nullopt;
+    }
+    constexpr std::size_t schemeLength = 7;
+    const bool bearer = lowered(head.authorization.substr(0, schemeLength)) == "bearer ";
+    const auto token = bearer ? tokens_.find(head.authorization.substr(schemeLength)) : std::nullopt;
+    if (!token) {
+        return refuse(401, "The token is not valid.", peer, true);
+    }
+    principal.role = token->role;
+    principal.actor = token->name;
+    return std::nullopt;
+}
+
+bool Access::isAdmin(const Peer& peer) const {
+    if (peer.uid == 0 || peer.uid == geteuid()) {
+        return true;
+    }
+    const auto admins = groupNamed(settings_.adminGroup);
+    return admins && std::find(peer.groups.begin(), peer.groups.end(), *admins) != peer.groups.end();
+}
+
+bool Access::knowsHost(const std::string& host, const Peer& peer) const {
+    const auto [name, port] = splitHost(lowered(host));
+    if (!port.empty() && port != std::to_string(peer.localPort)) {
+        return false;
+    }
+    const auto isName = [&name = name](const std::string& each) { return lowered(each) == name; };
+    return name == "localhost" || name == "127.0.0.1" || name == "::1" || name == peer.localAddress ||
+           std::any_of(settings_.hostNames.begin(), settings_.hostNames.end(), isName);
+}
+
+Refusal Access::refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const {
+    const std::string id = nextRequestId();
+    log_.write(id, "access refused (" + std::to_string(status) + ") to " + peer.address + ": " + detail);
+    Refusal refusal{problem(status, detail, id), delayed};
+    if (status == 401) {
+        refusal.response.headers.emplace_back("WWW-Authenticate", "Bearer");
+    }
+    return refusal;
+}
+
+} // namespace velt::host

@@ -1,0 +1,48 @@
+// Who may talk to the host.
+//
+// A Unix socket's peer is known by the kernel: root, the host's own user and the members of the
+// administrators' group are admins. Everybody else shows a bearer token. Requests that a page of another
+// origin makes a browser send are refused whoever sends them.
+#ifndef VELT_HOST_API_ACCESS_H
+#define VELT_HOST_API_ACCESS_H
+
+#include "host/api/token_store.h"
+#include "host/base/host_log.h"
+#include "host/http/message.h"
+
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+struct AccessSettings {
+    std::string adminGroup = "velt-admin";
+    std::vector<std::string>
+        hostNames; ///< that clients may use for this host beside its addresses and "localhost"
+};
+
+/// Thread-safe.
+class Access {
+public:
+    /// The store and the log outlive it.
+    Access(AccessSettings settings, const TokenStore& tokens, HostLog& log);
+
+    /// Fills `principal` and returns nothing when the request may go on.
+    std::optional<Refusal> check(const HttpRequest& head, const Peer& peer, Principal& principal) const;
+
+private:
+    std::optional<Refusal> authenticate(const HttpRequest& head, const Peer& peer,
+                                        Principal& principal) const;
+    bool isAdmin(const Peer& peer) const;
+    bool knowsHost(const std::string& host, const Peer& peer) const;
+    Refusal refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const;
+
+    AccessSettings settings_;
+    const TokenStore& tokens_;
+    HostLog& log_;
+};
+
+} // namespace velt::host
+
+#endif

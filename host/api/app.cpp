@@ -1,0 +1,156 @@
+#include "host/api/app.h"
+
+#include "host/api/log.h"
+#include "host/api/problem.h"
+#include "host/api/status.h"
+#include "host/api/tokens.h"
+#include "host/base/percent_encoding.h"
+#include "host/base/random_text.h"
+
+#include <algorithm>
+#include <exception>
+#include <utility>
+
+namespace velt::host {
+
+namespace {
+
+using Path = std::vector<std::string>;
+
+bool matches(const Path& path, const Path& pattern) {
+    return std::equal(path.begin(), path.end(), pattern.begin(), pattern.end(),
+                      [](const std::string& segment, const std::string& wanted) {
+                          return wanted == "*" || segment == wanted;
+                      });
+}
+
+void finish(const HttpHandler::Done& done, const Call& call, HttpResponse response) {
+    response.headers.emplace_back("X-Request-Id", call.id);
+    done(std::move(response));
+}
+
+HttpResponse notFound(const Call& call) {
+    return problem(404, "Nothing is served at " + call.request.path() + ". GET /api lists the rows.",
+                   call.id);
+}
+
+HttpResponse notAllowed(const Call& call, const std::string& allow) {
+    HttpResponse response = problem(
+        405, "The method " + call.request.method + " is not served here, only " + allow + ".", call.id);
+    response.headers.emplace_back("Allow", allow);
+    return response;
+}
+
+HttpResponse tooBusy(const Call& call) {
+    HttpResponse response =
+        problem(503, "Too many requests are waiting, or the host is stopping. Try again later.", call.id);
+    response.headers.emplace_back("Retry-After", "5");
+    return response;
+}
+
+} // namespace
+
+App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
+    : log_(log), tokens_(settings.tokenFile), access_(settings.access, tokens_, log),
+      platformEvents_(events_), rows_(table, openApi_, metrics_, events_, log),
+      order_(settings.workers, settings.maxWaiting) {
+    addRoutes(table);
+}
+
+void App::addRoutes(const ModuleTable& table) {
+    const auto add = [this](std::vector<Route> routes) {
+        std::move(routes.begin(), routes.end(), std::back_inserter(routes_));
+    };
+    add(rows_.routes());
+    add(statusRoutes(table));
+    add(tokenRoutes(tokens_, log_));
+    add({logRoute(), metricsRoute(metrics_, table, events_), openApiRoute(openApi_), eventRoute()});
+}
+
+std::optional<Refusal> App::checkAccess(const HttpRequest& head, const Peer& peer, Principal& principal) {
+    auto refusal = access_.check(head, peer, principal);
+    if (refusal) {
+        metrics_.countRefusal(refusal->response.status);
+    }
+    return refusal;
+}
+
+bool App::asksForEvents(const HttpRequest& request) const {
+    const auto path = pathSegments(request.path());
+    return path && std::any_of(routes_.begin(), routes_.end(), [&](const Route& each) {
+               return !each.answer && each.method == request.method && matches(*path, each.path);
+           });
+}
+
+void App::addEventReader(const std::shared_ptr<EventReader>& reader) {
+    events_.add(reader);
+}
+
+HttpResponse App::failure(int status, const std::string& detail) {
+    const std::string id = nextRequestId();
+    metrics_.countRefusal(status);
+    log_.write(id, std::to_string(status) + " " + detail);
+    return problem(status, detail, id);
+}
+
+void App::handle(HttpRequest request, const Principal& principal, Done done) {
+    const auto job =
+        std::make_shared<Job>(Job{{std::move(request), {}, principal, nextRequestId()}, std::move(done)});
+    try {
+        route(job);
+    } catch (const std::exception& error) {
+        finish(job->done, job->call, internalError(error.what(), job->call));
+    }
+}
+
+void App::route(const JobPointer& job) {
+    Call& call = job->call;
+    auto path = pathSegments(call.request.path());
+    if (!path) {
+        finish(job->done, call, problem(400, "The path is not percent-encoded UTF-8.", call.id));
+        return;
+    }
+    call.path = std::move(*path);
+    std::string allow;
+    for (const Route& each : routes_) {
+        if (!matches(call.path, each.path)) {
+            continue;
+        }
+        if (call.request.method == each.method) {
+            submit(job, each);
+            return;
+        }
+        allow += (allow.empty() ? "" : ", ") + each.method;
+    }
+    finish(job->done, call, allow.empty() ? notFound(call) : notAllowed(call, allow));
+}
+
+void App::submit(const JobPointer& job, const Route& route) {
+    if (route.adminOnly && job->call.principal.role != Role::admin) {
+        finish(job->done, job->call, problem(403, "This needs the role admin.", job->call.id));
+        return;
+    }
+    const bool accepted = order_.submit(
+        route.kind, [this, job, &route] { finish(job->done, job->call, answer(route, job->call)); });
+    if (!accepted) {
+        finish(job->done, job->call, tooBusy(job->call));
+    }
+}
+
+HttpResponse App::answer(const Route& route, const Call& call) {
+    try {
+        return route.answer(call);
+    } catch (const TokenError& error) {
+        log_.write(call.id, error.what());
+        return problem(500, error.what(), call.id);
+    } catch (const std::exception& error) {
+        return internalError(error.what(), call);
+    }
+}
+
+HttpResponse App::internalError(const std::string& reason, const Call& call) {
+    log_.write(call.id, "internal error: " + reason);
+    return problem(500, "The host failed. Its log says more under this request id.", call.id);
+}
+
+} // namespace velt::host

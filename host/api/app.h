@@ -1,0 +1,75 @@
+// Leads requests to the resources that answer them, in the order that they need.
+#ifndef VELT_HOST_API_APP_H
+#define VELT_HOST_API_APP_H
+
+#include "host/api/access.h"
+#include "host/api/event_hub.h"
+#include "host/api/events.h"
+#include "host/api/metrics.h"
+#include "host/api/openapi.h"
+#include "host/api/route.h"
+#include "host/api/rows.h"
+#include "host/api/token_store.h"
+#include "host/base/host_log.h"
+#include "host/http/message.h"
+#include "host/module/module_table.h"
+#include "host/module/request_order.h"
+
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+struct AppSettings {
+    AccessSettings access;
+    std::filesystem::path tokenFile;
+    unsigned workers = 4;          ///< threads on which modules run
+    std::size_t maxWaiting = 1000; ///< requests that wait for their turn
+};
+
+class App final : public HttpHandler {
+public:
+    /// The table and the log outlive it. Throws TokenError.
+    App(const AppSettings& settings, const ModuleTable& table, HostLog& log);
+
+    std::optional<Refusal> checkAccess(const HttpRequest& head, const Peer& peer,
+                                       Principal& principal) override;
+    bool asksForEvents(const HttpRequest& request) const override;
+    void handle(HttpRequest request, const Principal& principal, Done done) override;
+    HttpResponse failure(int status, const std::string& detail) override;
+    void addEventReader(const std::shared_ptr<EventReader>& reader) override;
+
+    /// Finishes the requests that were accepted and accepts no more.
+    void stop() { order_.stop(); }
+
+private:
+    /// A call on its way.
+    struct Job {
+        Call call;
+        Done done;
+    };
+    using JobPointer = std::shared_ptr<Job>;
+
+    void addRoutes(const ModuleTable& table);
+    void route(const JobPointer& job);
+    void submit(const JobPointer& job, const Route& route);
+    HttpResponse answer(const Route& route, const Call& call);
+    HttpResponse internalError(const std::string& reason, const Call& call);
+
+    HostLog& log_;
+    TokenStore tokens_;
+    Access access_;
+    OpenApi openApi_;
+    Metrics metrics_;
+    EventHub events_;
+    PlatformEvents platformEvents_;
+    Rows rows_;
+    std::vector<Route> routes_;
+    RequestOrder order_; // the last, so that its threads end before what they use
+};
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,38 @@
+#include "host/api/events.h"
+
+#include "host/api/log.h"
+
+namespace velt::host {
+
+namespace {
+
+std::string valueOf(const SystemEvent& event, const char* key) {
+    const auto found = event.parameters.find(key);
+    return found == event.parameters.end() ? "" : found->second;
+}
+
+void publish(EventHub& hub, const SystemEvent& event) {
+    if (event.name == "velt.service.action") {
+        Json::Value data(Json::objectValue);
+        data["service"] = valueOf(event, "SERVICE_NAME");
+        data["action"] = valueOf(event, "SERVICE_ACTION");
+        hub.publish("service", data);
+    }
+}
+
+} // namespace
+
+PlatformEvents::PlatformEvents(EventHub& hub)
+    : events_(subscribeEvents([&hub](const SystemEvent& event) { publish(hub, event); })),
+      log_(subscribeLog([&hub](const LogEntry& entry) { hub.publish("log", toObject(entry)); })) {}
+
+PlatformEvents::~PlatformEvents() {
+    unsubscribe(events_);
+    unsubscribe(log_);
+}
+
+Route eventRoute() {
+    return {"GET", {"events"}, false, RequestOrder::Kind::unordered, {}};
+}
+
+} // namespace velt::host

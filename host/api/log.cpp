@@ -1,0 +1,175 @@
+#include "host/api/log.h"
+
+#include "host/api/problem.h"
+#include "host/base/clock.h"
+#include "host/base/percent_encoding.h"
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <cstdio>
+#include <sstream>
+
+namespace velt::host {
+
+namespace {
+
+constexpr int maxLimit = 1000;
+
+/// What a filter takes instead of what it was given.
+struct BadFilter {
+    FieldError error;
+};
+
+template<class Number> std::optional<Number> parseNumber(std::string_view text, int base = 10) {
+    Number value = 0;
+    const char* const end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, value, base);
+    return error == std::errc() && stop == end ? std::optional(value) : std::nullopt;
+}
+
+std::optional<std::int64_t> positiveNumber(const std::string& text) {
+    const auto value = parseNumber<std::int64_t>(text);
+    return value && *value > 0 ? value : std::nullopt;
+}
+
+/// "0x11B00012", or the same number in decimal.
+std::optional<unsigned> eventNumber(const std::string& text) {
+    if (text.starts_with("0x") || text.starts_with("0X")) {
+        return parseNumber<unsigned>(std::string_view(text).substr(2), 16);
+    }
+    const auto value = parseNumber<unsigned>(text);
+    return value && *value > 0 ? value : std::nullopt;
+}
+
+/// Forms write a blank as "+".
+std::optional<std::string> queryValue(std::string text) {
+    std::replace(text.begin(), text.end(), '+', ' ');
+    return percentDecoded(text);
+}
+
+/// Each filter: its key, what it takes, and a function that takes it over and says whether it was that.
+struct Filter {
+    const char* key;
+    const char* expected;
+    bool (*take)(const std::string& value, LogFilter& filter);
+};
+
+constexpr std::array<Filter, 5> filters{{
+    {"since", "a time such as 2026-11-21T06:30:00Z",
+     [](const std::string& value, LogFilter& filter) {
+         filter.since = parseTimestamp(value);
+         return filter.since.has_value();
+     }},
+    {"event", "an event number such as 0x11B00012",
+     [](const std::string& value, LogFilter& filter) {
+         filter.event = eventNumber(value);
+         return filter.event.has_value();
+     }},
+    {"actor", "a name",
+     [](const std::string& value, LogFilter& filter) {
+         filter.actor = value;
+         return true;
+     }},
+    {"before", "the id of an entry",
+     [](const std::string& value, LogFilter& filter) {
+         filter.beforeId = positiveNumber(value);
+         return filter.beforeId.has_value();
+     }},
+    {"limit", "a number from 1 to 1000",
+     [](const std::string& value, LogFilter& filter) {
+         const auto limit = positiveNumber(value);
+         filter.limit = static_cast<int>(limit && *limit <= maxLimit ? *limit : 0);
+         return filter.limit > 0;
+     }},
+}};
+
+void takeFilter(const std::string& key, const std::string& text, LogFilter& filter) {
+    const auto value = queryValue(text);
+    if (!value) {
+        throw BadFilter{{key, "a percent-encoded value in UTF-8"}};
+    }
+    const auto* const known =
+        std::find_if(filters.begin(), filters.end(), [&key](const Filter& each) { return each.key == key; });
+    if (known == filters.end()) {
+        throw BadFilter{{key, "one of since, event, actor, before and limit"}};
+    }
+    // An empty filter does not narrow.
+    if (!value->empty() && !known->take(*value, filter)) {
+        throw BadFilter{{key, known->expected}};
+    }
+}
+
+/// Reads "since=...&event=...". Throws BadFilter.
+LogFilter parseQuery(const std::string& query) {
+    LogFilter filter;
+    std::istringstream parts(query);
+    for (std::string part; std::getline(parts, part, '&');) {
+        const std::size_t equals = part.find('=');
+        takeFilter(part.substr(0, equals), equals == std::string::npos ? "" : part.substr(equals + 1),
+                   filter);
+    }
+    return filter;
+}
+
+/// The id to ask on from after this page; null when no entry comes after it.
+std::optional<Json::Value> nextAfter(const std::vector<LogEntry>& page, LogFilter filter) {
+    if (page.size() < static_cast<std::size_t>(filter.limit)) {
+        return Json::Value();
+    }
+    filter.beforeId = page.back().id;
+    filter.limit = 1;
+    const auto rest = queryLog(filter);
+    if (!rest) {
+        return std::nullopt;
+    }
+    return rest->empty() ? Json::Value() : Json::Value(Json::Int64{page.back().id});
+}
+
+HttpResponse answerPage(const LogFilter& filter, const Call& call) {
+    const auto page = queryLog(filter);
+    const auto next = page ? nextAfter(*page, filter) : std::nullopt;
+    if (!next) {
+        return problem(500, lastErrorSentence(), call.id);
+    }
+    Json::Value value(Json::objectValue);
+    value["next"] = *next;
+    value["entries"] = Json::Value(Json::arrayValue);
+    for (const LogEntry& entry : *page) {
+        value["entries"].append(toObject(entry));
+    }
+    return jsonResponse(200, value);
+}
+
+} // namespace
+
+Json::Value toObject(const LogEntry& entry) {
+    std::array<char, 16> event{};
+    std::snprintf(event.data(), event.size(), "0x%08X", entry.event);
+    Json::Value object(Json::objectValue);
+    object["id"] = Json::Int64{entry.id};
+    object["time"] = timestamp(entry.time);
+    object["category"] = entry.category;
+    object["level"] = entry.level;
+    object["event"] = event.data();
+    object["text"] = entry.sentence;
+    object["args"] = Json::Value(Json::arrayValue);
+    for (const std::string& text : entry.texts) {
+        object["args"].append(text);
+    }
+    object["actor"] = entry.actor;
+    object["address"] = entry.address;
+    return object;
+}
+
+Route logRoute() {
+    return {"GET", {"api", "log"}, false, RequestOrder::Kind::unordered, [](const Call& call) {
+                try {
+                    return answerPage(parseQuery(call.request.query()), call);
+                } catch (const BadFilter& bad) {
+                    return fieldProblem(400, bad.error, "", call.id);
+                }
+            }};
+}
+
+} // namespace velt::host

@@ -1,0 +1,125 @@
+#include "host/api/metrics.h"
+
+#include "host/api/services.h"
+
+#include <prometheus/counter.h>
+#include <prometheus/gauge.h>
+#include <prometheus/histogram.h>
+#include <prometheus/registry.h>
+#include <prometheus/text_serializer.h>
+
+#include <map>
+#include <mutex>
+
+namespace velt::host {
+
+namespace {
+
+// Reads take milliseconds; a change restarts daemons, which takes seconds.
+const prometheus::Histogram::BucketBoundaries durations{0.001, 0.003, 0.01, 0.03, 0.1, 0.3, 1, 3, 10, 30};
+
+std::map<std::string, std::string> labelsOf(const Row& row, const Outcome& outcome) {
+    std::string result = outcome.down.empty() ? "success" : "service_down";
+    if (outcome.kind != Outcome::Kind::success) {
+        result = outcome.kind == Outcome::Kind::refused ? std::to_string(outcome.code) : "defect";
+    }
+    return {{"api", row.api},
+            {"version", std::to_string(row.version)},
+            {"method", row.method},
+            {"outcome", result}};
+}
+
+} // namespace
+
+struct Metrics::Families {
+    prometheus::Registry registry;
+    prometheus::Family<prometheus::Counter>& requests = prometheus::BuildCounter()
+                                                            .Name("velt_requests_total")
+                                                            .Help("Requests served by a module")
+                                                            .Register(registry);
+    prometheus::Family<prometheus::Histogram>& durations = prometheus::BuildHistogram()
+                                                               .Name("velt_request_duration_seconds")
+                                                               .Help("Time that a module took for a request")
+                                                               .Register(registry);
+    prometheus::Family<prometheus::Counter>& refusals =
+        prometheus::BuildCounter()
+            .Name("velt_refused_requests_total")
+            .Help("Requests refused before they reached a module")
+            .Register(registry);
+    prometheus::Family<prometheus::Gauge>& wanted = prometheus::BuildGauge()
+                                                        .Name("velt_service_enabled")
+                                                        .Help("Whether a service is switched on")
+                                                        .Register(registry);
+    prometheus::Family<prometheus::Gauge>& up =
+        prometheus::BuildGauge().Name("velt_service_up").Help("Whether a service runs").Register(registry);
+    prometheus::Family<prometheus::Counter>& starts = prometheus::BuildCounter()
+                                                          .Name("velt_daemon_starts_total")
+                                                          .Help("Starts of a service that requests asked for")
+                                                          .Register(registry);
+    prometheus::Family<prometheus::Counter>& restarts =
+        prometheus::BuildCounter()
+            .Name("velt_daemon_restarts_total")
+            .Help("Starts of a daemon after it had ended by itself")
+            .Register(registry);
+    prometheus::Gauge& eventReaders = prometheus::BuildGauge()
+                                          .Name("velt_event_readers")
+                                          .Help("Open streams of events")
+                                          .Register(registry)
+                                          .Add({});
+    std::mutex mutex;
+    std::map<std::string, std::uint64_t> seenRestarts;
+};
+
+Metrics::Metrics() : families_(std::make_unique<Families>()) {}
+
+Metrics::~Metrics() = default;
+
+void Metrics::countRequest(const Row& row, const Outcome& outcome) {
+    const auto labels = labelsOf(row, outcome);
+    families_->requests.Add(labels).Increment();
+    families_->durations.Add(labels, durations).Observe(outcome.seconds);
+}
+
+void Metrics::countRefusal(int status) {
+    families_->refusals.Add({{"status", std::to_string(status)}}).Increment();
+}
+
+void Metrics::setService(const std::string& service, bool wanted, bool running) {
+    families_->wanted.Add({{"service", service}}).Set(wanted ? 1 : 0);
+    families_->up.Add({{"service", service}}).Set(running ? 1 : 0);
+}
+
+void Metrics::setDaemonRestarts(const std::string& daemon, std::uint64_t count) {
+    const std::lock_guard lock(families_->mutex);
+    std::uint64_t& seen = families_->seenRestarts[daemon];
+    // Less than before: it was counted anew from 0.
+    families_->restarts.Add({{"daemon", daemon}})
+        .Increment(static_cast<double>(count >= seen ? count - seen : count));
+    seen = count;
+}
+
+void Metrics::countDaemonStart(const std::string& service) {
+    families_->starts.Add({{"service", service}}).Increment();
+}
+
+void Metrics::setEventReaders(std::size_t count) {
+    families_->eventReaders.Set(static_cast<double>(count));
+}
+
+std::string Metrics::text() const {
+    return prometheus::TextSerializer().Serialize(families_->registry.Collect());
+}
+
+Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events) {
+    return {"GET", {"metrics"}, false, RequestOrder::Kind::read, [&](const Call& call) {
+                for (const Service& each : listServices(table, call.principal)) {
+                    metrics.setService(each.name, each.wanted.value_or(true), each.running);
+                }
+                metrics.setDaemonRestarts("ftp", daemonRestarts("ftpd"));
+                metrics.setDaemonRestarts("sftp", daemonRestarts("sftp"));
+                metrics.setEventReaders(events.readers());
+                return HttpResponse{200, "text/plain; version=0.0.4; charset=utf-8", metrics.text(), {}};
+            }};
+}
+
+} // namespace velt::host

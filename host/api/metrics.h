@@ -1,0 +1,55 @@
+// /metrics: requests and their durations by row and outcome, services up, daemon starts and restarts.
+#ifndef VELT_HOST_API_METRICS_H
+#define VELT_HOST_API_METRICS_H
+
+#include "host/api/event_hub.h"
+#include "host/api/route.h"
+#include "host/module/module_call.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <string>
+
+namespace velt::host {
+
+/// Thread-safe.
+class Metrics {
+public:
+    Metrics();
+    ~Metrics();
+    Metrics(const Metrics&) = delete;
+    Metrics& operator=(const Metrics&) = delete;
+
+    /// Counts a served request under "success", the module's code, "service_down" or "defect".
+    void countRequest(const Row& row, const Outcome& outcome);
+
+    /// Counts an answer that no module had a part in, by its status.
+    void countRefusal(int status);
+
+    void setService(const std::string& service, bool wanted, bool running);
+
+    /// Counts a start that was asked for.
+    void countDaemonStart(const std::string& service);
+
+    /// Takes over how often a daemon was started again after it had ended by itself, as counted elsewhere:
+    /// from 0 since some earlier moment.
+    void setDaemonRestarts(const std::string& daemon, std::uint64_t count);
+
+    void setEventReaders(std::size_t count);
+
+    /// The text format of Prometheus.
+    std::string text() const;
+
+private:
+    struct Families;
+
+    std::unique_ptr<Families> families_;
+};
+
+/// All of these outlive the route.
+Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events);
+
+} // namespace velt::host
+
+#endif

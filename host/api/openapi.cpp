@@ -1,0 +1,137 @@
+#include "host/api/openapi.h"
+
+#include "host/api/openapi_document.h"
+#include "host/api/schema_words.h"
+#include "host/base/json.h"
+
+#include <valijson/adapters/jsoncpp_adapter.hpp>
+#include <valijson/schema.hpp>
+#include <valijson/schema_parser.hpp>
+#include <valijson/validator.hpp>
+
+#include <algorithm>
+#include <map>
+#include <stdexcept>
+
+namespace velt::host {
+
+namespace {
+
+using Adapter = valijson::adapters::JsonCppAdapter;
+using Path = std::vector<std::string>;
+
+std::string pathOf(const Row& row) {
+    return "/api/" + row.api + "/v" + std::to_string(row.version) + "/" + row.method;
+}
+
+/// "<root>", "[rules]", "[2]" is "rules", "2".
+Path withoutBrackets(const Path& context) {
+    Path path;
+    for (std::size_t i = 1; i < context.size(); ++i) {
+        const std::string& element = context[i];
+        path.push_back(element.substr(1, element.size() - 2));
+    }
+    return path;
+}
+
+/// "rules", "2", "name" is "rules[2].name".
+std::string fieldName(const Path& path) {
+    std::string name;
+    for (const std::string& element : path) {
+        const bool index =
+            std::all_of(element.begin(), element.end(), [](char c) { return c >= '0' && c <= '9'; });
+        if (index) {
+            name += "[" + element + "]";
+        } else {
+            name += (name.empty() ? "" : ".") + element;
+        }
+    }
+    return name;
+}
+
+/// The property that the validator misses, or "": it says so only in words.
+std::string missingProperty(const std::string& description) {
+    constexpr std::string_view words = "Missing required property '";
+    if (!description.starts_with(words)) {
+        return "";
+    }
+    const std::size_t end = description.find('\'', words.size());
+    return description.substr(words.size(), end - words.size());
+}
+
+} // namespace
+
+struct OpenApi::Schemas {
+    struct Body {
+        Json::Value source;
+        valijson::Schema compiled;
+    };
+    std::map<std::string, std::unique_ptr<Body>> byPath;
+};
+
+OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>()) {
+    ParsedObject parsed = parseObject(text_);
+    if (!parsed.error.empty()) {
+        throw std::runtime_error("The description of the API is damaged: " + parsed.error);
+    }
+    document_ = std::move(parsed.value);
+    const Json::Value& paths = document_["paths"];
+    for (const std::string& path : paths.getMemberNames()) {
+        const Json::Value& source =
+            paths[path]["post"]["requestBody"]["content"]["application/json"]["schema"];
+        if (!source.isObject()) {
+            continue;
+        }
+        auto body = std::make_unique<Schemas::Body>();
+        body->source = source;
+        valijson::SchemaParser parser;
+        parser.populateSchema(Adapter(body->source), body->compiled);
+        schemas_->byPath.emplace(path, std::move(body));
+    }
+}
+
+OpenApi::~OpenApi() = default;
+
+bool OpenApi::describes(const Row& row) const {
+    return schemas_->byPath.contains(pathOf(row));
+}
+
+std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& parameters) const {
+    std::vector<FieldError> errors;
+    const auto found = schemas_->byPath.find(pathOf(row));
+    if (found == schemas_->byPath.end()) {
+        return errors;
+    }
+    const Schemas::Body& body = *found->second;
+    // Strict types, as the module's: the text "21" is no number.
+    valijson::Validator validator(valijson::Validator::kStrongTypes);
+    valijson::ValidationResults results;
+    validator.validate(body.compiled, Adapter(parameters), &results);
+    for (const auto& error : results) {
+        Path path = withoutBrackets(error.context);
+        const std::string missing = missingProperty(error.description);
+        if (!missing.empty()) {
+            path.push_back(missing);
+        }
+        const std::string field = fieldName(path);
+        const bool known = std::any_of(errors.begin(), errors.end(),
+                                       [&field](const FieldError& each) { return each.field == field; });
+        // Of nested schemas the validator also reports the outer ones, which say nothing new.
+        const bool holdsOther = std::any_of(errors.begin(), errors.end(), [&field](const FieldError& each) {
+            return field.empty() || each.field.starts_with(field + "[") ||
+                   each.field.starts_with(field + ".");
+        });
+        if (!known && !holdsOther) {
+            errors.push_back({field, expectationOf(body.source, path)});
+        }
+    }
+    return errors;
+}
+
+Route openApiRoute(const OpenApi& openApi) {
+    return {"GET", {"openapi.json"}, false, RequestOrder::Kind::unordered, [&openApi](const Call&) {
+                return HttpResponse{200, "application/json", openApi.text(), {}};
+            }};
+}
+
+} // namespace velt::host

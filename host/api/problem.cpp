@@ -1,0 +1,46 @@
+#include "host/api/problem.h"
+
+#include "host/base/json.h"
+#include "host/http/response_text.h"
+
+#include <utility>
+
+namespace velt::host {
+
+HttpResponse problem(int status, const std::string& detail, const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["detail"] = detail;
+    return problemWith(status, std::move(members), requestId);
+}
+
+HttpResponse problemWith(int status, Json::Value members, const std::string& requestId) {
+    members["status"] = status;
+    if (!members.isMember("title")) {
+        members["title"] = reasonPhrase(status);
+    }
+    members["request_id"] = requestId;
+    HttpResponse response = jsonResponse(status, members);
+    response.contentType = "application/problem+json";
+    return response;
+}
+
+HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
+                          const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["detail"] = error.field + ": expected " + error.expected + "." + extent;
+    members["errors"].append(toObject(error));
+    return problemWith(status, std::move(members), requestId);
+}
+
+Json::Value toObject(const FieldError& error) {
+    Json::Value object(Json::objectValue);
+    object["field"] = error.field;
+    object["expected"] = error.expected;
+    return object;
+}
+
+HttpResponse jsonResponse(int status, const Json::Value& value) {
+    return {status, "application/json", toJson(value), {}};
+}
+
+} // namespace velt::host

@@ -1,0 +1,37 @@
+// Answers that say what went wrong: application/problem+json, RFC 9457.
+#ifndef VELT_HOST_API_PROBLEM_H
+#define VELT_HOST_API_PROBLEM_H
+
+#include "host/http/message.h"
+
+#include <json/value.h>
+
+#include <string>
+
+namespace velt::host {
+
+/// A field that is not what it must be.
+struct FieldError {
+    std::string field;    ///< "portnum", "rules[2].name"
+    std::string expected; ///< "an integer from 1 to 65535"
+};
+
+/// A problem that the module had no part in; its title is the reason phrase.
+HttpResponse problem(int status, const std::string& detail, const std::string& requestId);
+
+/// A problem with the members given; those of RFC 9457 are filled in when they are missing.
+HttpResponse problemWith(int status, Json::Value members, const std::string& requestId);
+
+/// A problem with one field of what was sent; `extent` says what became of the request.
+HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
+                          const std::string& requestId);
+
+/// {"field", "expected"}
+Json::Value toObject(const FieldError& error);
+
+/// A JSON value with its status.
+HttpResponse jsonResponse(int status, const Json::Value& value);
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,138 @@
+#include "host/api/row_answer.h"
+
+#include "host/api/problem.h"
+#include "host/api/services.h"
+#include "host/module/module_log.h"
+
+#include <algorithm>
+#include <array>
+
+namespace velt::host {
+
+namespace {
+
+struct Meaning {
+    int code;
+    int status;
+    const char* title;
+    bool portTaken;
+};
+
+constexpr int badParameter = 1901;
+constexpr Meaning otherFailure{0, 500, "The operation failed", false};
+
+constexpr std::array<Meaning, 6> meanings{{
+    {badParameter, 422, "A parameter is not acceptable", false},
+    {1902, 500, "The operation failed", false},
+    {1903, 409, "The FTP port is taken", true},
+    {1904, 409, "The passive port range is taken", true},
+    {1905, 409, "The share cannot be reached over FTP", false},
+    {1951, 409, "The SFTP port is taken", true},
+}};
+
+const Meaning& meaningOf(int code) {
+    const auto* const found = std::find_if(meanings.begin(), meanings.end(),
+                                           [code](const Meaning& each) { return each.code == code; });
+    return found == meanings.end() ? otherFailure : *found;
+}
+
+void append(std::string& detail, const std::string& sentence) {
+    if (sentence.empty()) {
+        return;
+    }
+    detail += (detail.empty() ? "" : " ") + sentence;
+    if (detail.back() != '.' && detail.back() != ']') {
+        detail += '.';
+    }
+}
+
+std::string describe(const FieldError& error) {
+    return error.field + ": expected " + error.expected + ".";
+}
+
+/// How far a change got that the module has refused.
+std::string extentOf(const PlatformReport& platform) {
+    if (!platform.changed) {
+        return "Nothing was changed.";
+    }
+    if (!platform.stored) {
+        return "";
+    }
+    return platform.storeFailed ? "Some of the new settings are stored." : "The new settings are stored.";
+}
+
+std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& meaning,
+                     const std::vector<FieldError>& errors) {
+    std::string detail;
+    append(detail, reasonIn(outcome.logLines));
+    for (const FieldError& error : errors) {
+        append(detail, describe(error));
+    }
+    if (meaning.portTaken && !outcome.platform.conflict.holder.empty()) {
+        append(detail, "Port " + std::to_string(outcome.platform.conflict.port) + " is held by " +
+                           outcome.platform.conflict.holder + ".");
+    } else {
+        append(detail, outcome.platform.sentence);
+    }
+    if (!row.reads()) {
+        append(detail, extentOf(outcome.platform));
+    }
+    return detail;
+}
+
+HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<FieldError>& errors,
+                     const std::string& requestId) {
+    const Meaning& meaning = meaningOf(outcome.code);
+    Json::Value members(Json::objectValue);
+    members["title"] = meaning.title;
+    members["code"] = outcome.code;
+    members["detail"] = detailOf(row, outcome, meaning, errors);
+    if (!row.reads()) {
+        members["changed"] = outcome.platform.changed;
+    }
+    for (const FieldError& error : errors) {
+        members["errors"].append(toObject(error));
+    }
+    if (meaning.portTaken && !outcome.platform.conflict.holder.empty()) {
+        members["holder"] = outcome.platform.conflict.holder;
+    }
+    return problemWith(meaning.status, std::move(members), requestId);
+}
+
+/// The module is content, but what is switched on does not run.
+HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
+    Json::Value members(Json::objectValue);
+    members["title"] = "A service that is switched on does not run";
+    members["detail"] =
+        "What was asked for is stored, but a service does not follow. " + sentenceOf(outcome.down);
+    members["changed"] = outcome.platform.changed;
+    for (const ServiceDown& each : outcome.down) {
+        members["down"].append(toObject(each));
+    }
+    return problemWith(500, std::move(members), requestId);
+}
+
+} // namespace
+
+HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outcome& outcome,
+                       const OpenApi& openApi, const std::string& requestId) {
+    switch (outcome.kind) {
+    case Outcome::Kind::success:
+        if (!outcome.down.empty()) {
+            return serviceDown(outcome, requestId);
+        }
+        return outcome.data.isNull() ? HttpResponse{204, "", "", {}} : jsonResponse(200, outcome.data);
+    case Outcome::Kind::refused:
+        return refused(row, outcome,
+                       outcome.code == badParameter ? openApi.explain(row, parameters)
+                                                    : std::vector<FieldError>{},
+                       requestId);
+    default:
+        return problem(500,
+                       "The module did not answer as it must: " + outcome.defect +
+                           ". The host's log has more under this request's id.",
+                       requestId);
+    }
+}
+
+} // namespace velt::host

@@ -1,0 +1,20 @@
+// How the outcome of a module's call looks on the wire.
+#ifndef VELT_HOST_API_ROW_ANSWER_H
+#define VELT_HOST_API_ROW_ANSWER_H
+
+#include "host/api/openapi.h"
+#include "host/http/message.h"
+#include "host/module/module_call.h"
+
+#include <string>
+
+namespace velt::host {
+
+/// 200 with the value or 204; else a problem with the module's code, what an administrator can act on, and
+/// for refused parameters the fields that broke their description.
+HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outcome& outcome,
+                       const OpenApi& openApi, const std::string& requestId);
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,47 @@
+// /api: the rows of the modules, listed and called.
+#ifndef VELT_HOST_API_ROWS_H
+#define VELT_HOST_API_ROWS_H
+
+#include "host/api/event_hub.h"
+#include "host/api/metrics.h"
+#include "host/api/openapi.h"
+#include "host/api/revision.h"
+#include "host/api/route.h"
+#include "host/base/host_log.h"
+#include "host/module/module_table.h"
+
+#include <json/value.h>
+
+#include <vector>
+
+namespace velt::host {
+
+/// Thread-safe, when reads and writes are ordered as its routes say.
+class Rows {
+public:
+    /// All of these outlive it.
+    Rows(const ModuleTable& table, const OpenApi& openApi, Metrics& metrics, EventHub& events, HostLog& log);
+
+    /// It outlives its routes.
+    std::vector<Route> routes();
+
+private:
+    HttpResponse list() const;
+    HttpResponse call(const Row& row, const Call& call);
+    HttpResponse callAndAnswer(const Row& row, const Json::Value& parameters, const Call& call);
+    std::vector<ServiceDown> startWhatIsDown(const Principal& principal);
+    void countStarts(const PlatformReport& platform);
+    void publishChange(const Row& row, const Call& call);
+    void logOutcome(const Row& row, const Outcome& outcome, int status, const Call& call);
+
+    const ModuleTable& table_;
+    const OpenApi& openApi_;
+    Metrics& metrics_;
+    EventHub& events_;
+    HostLog& log_;
+    Revision revision_;
+};
+
+} // namespace velt::host
+
+#endif

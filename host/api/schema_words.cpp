@@ -1,0 +1,84 @@
+#include "host/api/schema_words.h"
+
+#include "host/base/json.h"
+
+namespace velt::host {
+
+namespace {
+
+/// The type that is not null: an optional parameter may be null, but nobody means that.
+std::string typeOf(const Json::Value& schema) {
+    const Json::Value& type = schema["type"];
+    if (!type.isArray()) {
+        return type.isString() ? type.asString() : "";
+    }
+    for (const Json::Value& each : type) {
+        if (each != "null") {
+            return each.asString();
+        }
+    }
+    return "";
+}
+
+std::string alternatives(const Json::Value& values) {
+    std::vector<std::string> texts;
+    for (const Json::Value& each : values) {
+        if (!each.isNull()) {
+            texts.push_back(toJson(each));
+        }
+    }
+    std::string words;
+    for (std::size_t i = 0; i < texts.size(); ++i) {
+        words += (i == 0 ? "" : (i + 1 == texts.size() ? " or " : ", ")) + texts[i];
+    }
+    return words;
+}
+
+std::string integerWords(const Json::Value& schema) {
+    if (schema.isMember("minimum") && schema.isMember("maximum")) {
+        return "an integer from " + schema["minimum"].asString() + " to " + schema["maximum"].asString();
+    }
+    return schema.isMember("minimum") ? "an integer of at least " + schema["minimum"].asString()
+                                      : "an integer";
+}
+
+std::string wordsFor(const Json::Value& schema) {
+    if (schema.isMember("enum")) {
+        return alternatives(schema["enum"]);
+    }
+    const std::string type = typeOf(schema);
+    if (type == "boolean") {
+        return "true or false";
+    }
+    if (type == "integer") {
+        return integerWords(schema);
+    }
+    if (type == "string") {
+        return schema["minLength"].asInt() > 0 ? "a text that is not empty" : "a text";
+    }
+    if (type == "array") {
+        return schema["minItems"].asInt() > 0 ? "a list with at least one element" : "a list";
+    }
+    return type == "object" ? "an object" : "another value";
+}
+
+} // namespace
+
+std::string expectationOf(const Json::Value& schema, const std::vector<std::string>& path) {
+    const Json::Value* place = &schema;
+    for (const std::string& element : path) {
+        const Json::Value& properties = (*place)["properties"];
+        if (properties.isObject() && properties.isMember(element)) {
+            place = &properties[element];
+        } else if ((*place)["items"].isObject()) {
+            place = &(*place)["items"];
+        } else {
+            return "another value";
+        }
+    }
+    const std::string words = wordsFor(*place);
+    const Json::Value& hint = (*place)["x-expected"];
+    return hint.isString() ? words + ": " + hint.asString() : words;
+}
+
+} // namespace velt::host

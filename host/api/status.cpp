@@ -1,0 +1,51 @@
+#include "host/api/status.h"
+
+#include "host/api/problem.h"
+#include "host/api/services.h"
+
+#include <chrono>
+
+namespace velt::host {
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+
+HttpResponse status(const ModuleTable& table, Clock::time_point start, const Call& call) {
+    Json::Value value(Json::objectValue);
+    value["version"] = VELT_VERSION;
+    const auto uptime = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - start);
+    value["uptime_seconds"] = Json::Int64{uptime.count()};
+    value["services"] = Json::Value(Json::arrayValue);
+    for (const Service& each : listServices(table, call.principal)) {
+        value["services"].append(toObject(each));
+    }
+    return jsonResponse(200, value);
+}
+
+HttpResponse health() {
+    Json::Value value(Json::objectValue);
+    const std::vector<ServiceDown> down = servicesDown();
+    value["status"] = down.empty() ? "ok" : "degraded";
+    for (const ServiceDown& each : down) {
+        value["down"].append(toObject(each));
+    }
+    return jsonResponse(200, value);
+}
+
+} // namespace
+
+std::vector<Route> statusRoutes(const ModuleTable& table) {
+    using Kind = RequestOrder::Kind;
+    return {
+        {"GET",
+         {"api", "status"},
+         false,
+         Kind::read,
+         [&table, start = Clock::now()](const Call& call) { return status(table, start, call); }},
+        // Not ordered: a change that takes long must not look like a host that hangs.
+        {"GET", {"healthz"}, false, Kind::unordered, [](const Call&) { return health(); }},
+    };
+}
+
+} // namespace velt::host

@@ -1,0 +1,75 @@
+// Bearer tokens. Only their hashes are stored: who reads the file cannot use it.
+#ifndef VELT_HOST_API_TOKEN_STORE_H
+#define VELT_HOST_API_TOKEN_STORE_H
+
+#include "host/http/message.h"
+
+#include <json/value.h>
+
+#include <filesystem>
+#include <mutex>
+#include <optional>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+/// The file of tokens cannot be read or written; what() is a sentence for the administrator.
+class TokenError : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+struct Token {
+    std::string id;
+    std::string name;
+    Role role = Role::viewer;
+    std::string created; ///< "2026-11-21T06:30:00.000Z"
+    std::string hash;    ///< SHA-256 of the token, 64 hexadecimal digits
+};
+
+/// What everybody may know of a token: all but its hash.
+Json::Value toObject(const Token& token);
+
+struct NewToken {
+    Token stored;
+    std::string text; ///< what its owner shows; never seen again
+};
+
+/// Thread-safe.
+class TokenStore {
+public:
+    /// Reads the file; there need be none yet. Throws TokenError when it is damaged: access is never guessed.
+    explicit TokenStore(std::filesystem::path file);
+
+    /// Makes a token with 256 random bits. Throws TokenError when it cannot be stored; there is no new token
+    /// then.
+    NewToken create(const std::string& name, Role role);
+
+    /// False when there is no such token. Throws TokenError when the change cannot be stored.
+    bool remove(const std::string& id);
+
+    std::vector<Token> tokens() const;
+
+    /// Whose token this is.
+    std::optional<Token> find(const std::string& token) const;
+
+private:
+    void read();
+    void store(const std::vector<Token>& tokens) const;
+
+    const std::filesystem::path file_;
+    mutable std::mutex mutex_;
+    std::vector<Token> tokens_;
+};
+
+/// "admin" or "viewer".
+const char* roleName(Role role);
+
+/// Nothing for another word.
+std::optional<Role> roleNamed(const std::string& name);
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,84 @@
+#include "host/api/tokens.h"
+
+#include "host/api/problem.h"
+#include "host/base/json.h"
+
+#include <algorithm>
+
+namespace velt::host {
+
+namespace {
+
+constexpr std::size_t maxName = 64;
+constexpr const char* noneMade = " No token was made.";
+
+/// A name that can stand in logs: not empty, no control characters.
+bool isName(const Json::Value& value) {
+    const std::string name = value.isString() ? value.asString() : "";
+    return !name.empty() && name.size() <= maxName && std::all_of(name.begin(), name.end(), [](char c) {
+        return static_cast<unsigned char>(c) >= 0x20 && c != 0x7F;
+    });
+}
+
+HttpResponse list(const TokenStore& store) {
+    Json::Value value(Json::objectValue);
+    value["tokens"] = Json::Value(Json::arrayValue);
+    for (const Token& token : store.tokens()) {
+        value["tokens"].append(toObject(token));
+    }
+    return jsonResponse(200, value);
+}
+
+HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
+    const ParsedObject parsed = parseObject(call.request.body);
+    if (!parsed.error.empty()) {
+        return problem(400, "The body is not a JSON object: " + parsed.error + "." + noneMade, call.id);
+    }
+    const Json::Value& name = parsed.value["name"];
+    if (!isName(name)) {
+        return fieldProblem(422, {"name", "a text of 1 to 64 bytes without control characters"}, noneMade,
+                            call.id);
+    }
+    const Json::Value& word = parsed.value["role"];
+    const auto role = word.isString() ? roleNamed(word.asString()) : std::nullopt;
+    if (!role) {
+        return fieldProblem(422, {"role", "\"admin\" or \"viewer\""}, noneMade, call.id);
+    }
+    const auto [token, text] = store.create(name.asString(), *role);
+    log.write(call.id, "token " + token.id + " made for " + token.name + " (" + roleName(token.role) +
+                           ") by " + call.principal.actor);
+    Json::Value value = toObject(token);
+    value.removeMember("created");
+    value["token"] = text;
+    return jsonResponse(201, value);
+}
+
+HttpResponse remove(TokenStore& store, HostLog& log, const Call& call) {
+    const std::string& id = call.path.back();
+    if (!store.remove(id)) {
+        return problem(404, "There is no token with the id " + id + ".", call.id);
+    }
+    log.write(call.id, "token " + id + " removed by " + call.principal.actor);
+    return {204, "", "", {}};
+}
+
+} // namespace
+
+std::vector<Route> tokenRoutes(TokenStore& store, HostLog& log) {
+    using Kind = RequestOrder::Kind;
+    return {
+        {"GET", {"api", "tokens"}, true, Kind::unordered, [&store](const Call&) { return list(store); }},
+        {"POST",
+         {"api", "tokens"},
+         true,
+         Kind::unordered,
+         [&](const Call& call) { return create(store, log, call); }},
+        {"DELETE",
+         {"api", "tokens", "*"},
+         true,
+         Kind::unordered,
+         [&](const Call& call) { return remove(store, log, call); }},
+    };
+}
+
+} // namespace velt::host

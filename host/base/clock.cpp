@@ -1,0 +1,76 @@
+#include "host/base/clock.h"
+
+#include <array>
+#include <charconv>
+#include <cstdint>
+#include <cstdio>
+#include <ctime>
+
+namespace velt::host {
+
+namespace {
+
+using std::chrono::milliseconds;
+
+std::tm brokenDown(TimePoint time) {
+    const std::time_t seconds = std::chrono::system_clock::to_time_t(time);
+    std::tm parts{};
+    gmtime_r(&seconds, &parts);
+    return parts;
+}
+
+/// ".5Z" is 500 ms; nothing when it is neither empty, "Z", nor decimals before a "Z".
+std::optional<milliseconds> parseFraction(std::string_view text) {
+    int count = 0;
+    if (text.starts_with('.')) {
+        int unit = 100;
+        text.remove_prefix(1);
+        for (; !text.empty() && text[0] >= '0' && text[0] <= '9'; text.remove_prefix(1)) {
+            count += (text[0] - '0') * unit;
+            unit /= 10;
+        }
+    }
+    return text.empty() || text == "Z" ? std::optional(milliseconds(count)) : std::nullopt;
+}
+
+} // namespace
+
+std::string timestamp(TimePoint time) {
+    const std::tm parts = brokenDown(time);
+    const auto sinceEpoch = std::chrono::duration_cast<milliseconds>(time.time_since_epoch());
+    std::array<char, 64> text{};
+    const std::size_t length = std::strftime(text.data(), text.size(), "%Y-%m-%dT%H:%M:%S", &parts);
+    std::snprintf(text.data() + length, text.size() - length, ".%03dZ",
+                  static_cast<int>(sinceEpoch.count() % 1000));
+    return text.data();
+}
+
+std::optional<TimePoint> parseTimestamp(const std::string& text) {
+    std::int64_t seconds = 0;
+    const char* const end = text.data() + text.size();
+    if (const auto [stop, error] = std::from_chars(text.data(), end, seconds);
+        error == std::errc() && stop == end && seconds >= 0 && seconds < 100'000'000'000) {
+        return TimePoint(std::chrono::seconds(seconds));
+    }
+    std::tm parts{};
+    const char* rest = strptime(text.c_str(), "%Y-%m-%dT%H:%M:%S", &parts);
+    if (rest == nullptr) {
+        parts = {};
+        rest = strptime(text.c_str(), "%Y-%m-%d", &parts);
+    }
+    if (rest == nullptr) {
+        return std::nullopt;
+    }
+    const auto fraction = parseFraction(rest);
+    return fraction ? std::optional(std::chrono::system_clock::from_time_t(timegm(&parts)) + *fraction)
+                    : std::nullopt;
+}
+
+std::string httpDate() {
+    const std::tm parts = brokenDown(std::chrono::system_clock::now());
+    std::array<char, 64> text{};
+    std::strftime(text.data(), text.size(), "%a, %d %b %Y %H:%M:%S GMT", &parts);
+    return text.data();
+}
+
+} // namespace velt::host

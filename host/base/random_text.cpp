@@ -1,0 +1,47 @@
+#include "host/base/random_text.h"
+
+#include <sys/random.h>
+
+#include <array>
+#include <atomic>
+#include <cerrno>
+#include <cstdint>
+#include <cstdio>
+#include <system_error>
+#include <vector>
+
+namespace velt::host {
+
+std::string hexadecimal(const unsigned char* bytes, std::size_t count) {
+    constexpr char digits[] = "0123456789abcdef";
+    std::string text;
+    text.reserve(2 * count);
+    for (std::size_t i = 0; i < count; ++i) {
+        text += digits[bytes[i] >> 4U];
+        text += digits[bytes[i] & 0xFU];
+    }
+    return text;
+}
+
+std::string randomHexadecimal(std::size_t bytes) {
+    std::vector<unsigned char> buffer(bytes);
+    std::size_t filled = 0;
+    while (filled < bytes) {
+        const ssize_t count = getrandom(buffer.data() + filled, bytes - filled, 0);
+        if (count < 0 && errno != EINTR) {
+            throw std::system_error(errno, std::generic_category(), "getrandom");
+        }
+        filled += count > 0 ? static_cast<std::size_t>(count) : 0;
+    }
+    return hexadecimal(buffer.data(), bytes);
+}
+
+std::string nextRequestId() {
+    static const std::string run = randomHexadecimal(4);
+    static std::atomic<std::uint64_t> count{0};
+    std::array<char, 24> number{};
+    std::snprintf(number.data(), number.size(), "-%06llx", static_cast<unsigned long long>(++count));
+    return run + number.data();
+}
+
+} // namespace velt::host

@@ -1,0 +1,38 @@
+// One call of a module's entry function, and what came of it.
+#ifndef VELT_HOST_MODULE_MODULE_CALL_H
+#define VELT_HOST_MODULE_MODULE_CALL_H
+
+#include "host/module/module_table.h"
+#include "host/module/platform_request.h"
+
+#include <json/value.h>
+
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+struct Outcome {
+    enum class Kind {
+        success, ///< `data` is the value, null for none
+        refused, ///< `code` is the module's number
+        broken,  ///< the module broke its contract: `defect` says how
+    };
+    Kind kind = Kind::broken;
+    int code = 0;
+    Json::Value data;
+    std::string defect;
+    std::vector<std::string> logLines;
+    PlatformReport platform;
+    std::vector<ServiceDown> down; ///< after a change that the module has accepted
+    double seconds = 0;
+};
+
+/// Calls the row's entry function on this thread, in the actor's name. Nothing that the module throws leaves
+/// it.
+Outcome callRow(const Row& row, const Json::Value& parameters, const std::string& actor,
+                const std::string& address);
+
+} // namespace velt::host
+
+#endif

@@ -1,0 +1,51 @@
+#include "host/module/platform_request.h"
+
+#include <utility>
+
+namespace velt::host {
+
+PlatformRequest::PlatformRequest(const std::string& actor, const std::string& address) {
+    clearLastError();
+    setRequestActor(actor, address);
+    setEffectReport([this](Effect effect, std::string_view subject, int result, std::chrono::nanoseconds) {
+        note(effect, subject, result >= 0);
+    });
+}
+
+PlatformRequest::~PlatformRequest() {
+    setEffectReport({});
+    setRequestActor("", "");
+}
+
+PlatformReport PlatformRequest::finish() {
+    setEffectReport({});
+    report_.sentence = lastErrorSentence();
+    report_.conflict = lastPortConflict();
+    return std::move(report_);
+}
+
+void PlatformRequest::note(Effect effect, std::string_view subject, bool done) {
+    switch (effect) {
+    case Effect::store:
+        report_.stored = report_.stored || done;
+        report_.storeFailed = report_.storeFailed || !done;
+        report_.changed = report_.changed || done;
+        break;
+    case Effect::runKey:
+        report_.changed = report_.changed || done;
+        break;
+    case Effect::start:
+        if (done) {
+            report_.started.emplace_back(subject);
+        }
+        [[fallthrough]];
+    case Effect::stop:
+        // A daemon whose start or stop failed half-way has changed, too.
+        report_.changed = true;
+        break;
+    default:
+        break;
+    }
+}
+
+} // namespace velt::host

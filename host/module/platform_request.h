@@ -1,0 +1,41 @@
+// What a request does to the platform while a thread serves it.
+#ifndef VELT_HOST_MODULE_PLATFORM_REQUEST_H
+#define VELT_HOST_MODULE_PLATFORM_REQUEST_H
+
+#include "standalone/standalone.h"
+
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+struct PlatformReport {
+    bool changed = false;             ///< something was stored, started or stopped
+    bool stored = false;              ///< something was stored
+    bool storeFailed = false;         ///< something could not be stored
+    std::vector<std::string> started; ///< the services that were started
+    std::string sentence;             ///< of the last error; "" when there was none
+    PortConflict conflict;            ///< the port that was found taken
+};
+
+/// Tells the platform who makes the request that this thread serves, and takes notes, while it lives. Stays
+/// on its thread.
+class PlatformRequest {
+public:
+    PlatformRequest(const std::string& actor, const std::string& address);
+    ~PlatformRequest();
+    PlatformRequest(const PlatformRequest&) = delete;
+    PlatformRequest& operator=(const PlatformRequest&) = delete;
+
+    /// Ends the request, and tells what it did. To be called once.
+    PlatformReport finish();
+
+private:
+    void note(Effect effect, std::string_view subject, bool done);
+
+    PlatformReport report_;
+};
+
+} // namespace velt::host
+
+#endif

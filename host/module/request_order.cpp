@@ -1,0 +1,98 @@
+#include "host/module/request_order.h"
+
+#include <utility>
+
+namespace velt::host {
+
+namespace {
+
+constexpr unsigned unorderedThreads = 2;
+
+} // namespace
+
+RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting) : maxWaiting_(maxWaiting) {
+    threads_.reserve(threads + unorderedThreads);
+    for (unsigned i = 0; i < threads; ++i) {
+        threads_.emplace_back([this] { work(ordered_); });
+    }
+    for (unsigned i = 0; i < unorderedThreads; ++i) {
+        threads_.emplace_back([this] { work(unordered_); });
+    }
+}
+
+RequestOrder::~RequestOrder() {
+    stop();
+}
+
+bool RequestOrder::submit(Kind kind, Task task) {
+    Pool& pool = kind == Kind::unordered ? unordered_ : ordered_;
+    {
+        const std::lock_guard lock(mutex_);
+        if (stopping_ || pool.queue.size() >= maxWaiting_) {
+            return false;
+        }
+        pool.queue.push_back({kind, std::move(task)});
+    }
+    pool.changed.notify_one();
+    return true;
+}
+
+void RequestOrder::stop() {
+    {
+        const std::lock_guard lock(mutex_);
+        stopping_ = true;
+    }
+    ordered_.changed.notify_all();
+    unordered_.changed.notify_all();
+    for (std::thread& thread : threads_) {
+        if (thread.joinable()) {
+            thread.join();
+        }
+    }
+}
+
+bool RequestOrder::mayStart(Kind kind) const {
+    return kind == Kind::unordered || (!writing_ && (kind == Kind::read || reading_ == 0));
+}
+
+void RequestOrder::started(Kind kind) {
+    if (kind == Kind::read) {
+        ++reading_;
+    } else if (kind == Kind::write) {
+        writing_ = true;
+    }
+}
+
+void RequestOrder::finished(Kind kind) {
+    if (kind == Kind::read) {
+        --reading_;
+    } else if (kind == Kind::write) {
+        writing_ = false;
+    }
+}
+
+void RequestOrder::work(Pool& pool) {
+    std::unique_lock lock(mutex_);
+    while (true) {
+        if (pool.queue.empty() && stopping_) {
+            return;
+        }
+        if (pool.queue.empty() || !mayStart(pool.queue.front().kind)) {
+            pool.changed.wait(lock);
+            continue;
+        }
+        Waiting next = std::move(pool.queue.front());
+        pool.queue.pop_front();
+        started(next.kind);
+        lock.unlock();
+        // The next in the queue may be a read that can run beside this one.
+        pool.changed.notify_one();
+        next.task();
+        next.task = nullptr;
+        lock.lock();
+        finished(next.kind);
+        pool.changed.notify_all();
+    }
+}
+
+} // namespace velt::host

@@ -1,0 +1,163 @@
+// The stream of events.
+
+#include "host/api/event_hub.h"
+#include "tests/host/fake_standalone.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+#include <sys/socket.h>
+
+#include <thread>
+
+namespace {
+
+using std::chrono::milliseconds;
+using velt::LogEntry;
+
+const std::string sftpSet = "/api/VELT.Core.FileServ.FTP.SFTP/v1/set";
+
+class HostEvents : public HostTest {
+protected:
+    void SetUp() override {
+        fake::Platform::instance().reset();
+        access = {};
+        settings.workers = 1;
+    }
+
+    /// A connection on which the stream of events has begun.
+    Client listen() const {
+        Client client = connect();
+        client.send(requestText("GET", "/events", admin));
+        EXPECT_NE(client.readUntil(": connected\n\n"), "");
+        // The server adds the reader right after that.
+        std::this_thread::sleep_for(milliseconds(100));
+        return client;
+    }
+
+    FakeStandalone& access = FakeStandalone::instance();
+};
+
+TEST_F(HostEvents, EventsTellWhatAChangeDid) {
+    start();
+    Client events = listen();
+    EXPECT_EQ(post(sftpSet, R"({"enable":true,"portnum":2222})").status, 204);
+    std::string text = events.readUntil("event: request\n");
+    text += events.readUntil("\n\n");
+    EXPECT_NE(text.find("event: log\ndata: {"), std::string::npos) << text;
+    EXPECT_NE(text.find(R"("method":"set")"), std::string::npos) << text;
+    EXPECT_NE(text.find(R"("actor":"admin")"), std::string::npos) << text;
+}
+
+TEST_F(HostEvents, AServiceActionIsAnEvent) {
+    start();
+    Client events = listen();
+    access.announce("ftpd-pure", "stop");
+    EXPECT_EQ(events.readUntil("\n\n"),
+              "event: service\ndata: {\"action\":\"stop\",\"service\":\"ftpd-pure\"}\n\n");
+}
+
+TEST_F(HostEvents, WhatChangesNothingIsNoEvent) {
+    start();
+    Client events = listen();
+    EXPECT_EQ(post(sftpSet, R"({"enable":false})").status, 204);
+    EXPECT_EQ(post(sftpSet, R"({"enable":7})").status, 422);
+    EXPECT_EQ(get("/api/status").status, 200);
+    access.announce("mark", "mark");
+    EXPECT_EQ(events.readUntil("\n\n").find("event: service"), 0U);
+}
+
+TEST_F(HostEvents, AnIdleStreamBeats) {
+    limits.heartbeat = milliseconds(50);
+    start();
+    Client events = listen();
+    EXPECT_EQ(events.readUntil(": beat\n\n").substr(0, 8), ": beat\n\n");
+    EXPECT_NE(events.readUntil(": beat\n\n"), "");
+}
+
+TEST_F(HostEvents, ViewersMayListen) {
+    start();
+    Client client = connect();
+    client.send(requestText("GET", "/events", viewer));
+    const std::string head = client.readUntil("\r\n\r\n");
+    EXPECT_NE(head.find("200 OK"), std::string::npos);
+    EXPECT_NE(head.find("Content-Type: text/event-stream"), std::string::npos);
+}
+
+TEST_F(HostEvents, AReaderThatLeavesIsForgotten) {
+    start();
+    {
+        Client events = listen();
+        EXPECT_GE(server->connections(), 1U);
+    }
+    for (int i = 0; i < 300 && server->connections() > 0; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+    }
+    EXPECT_EQ(server->connections(), 0U);
+    access.announce("ftpd", "start");
+}
+
+TEST(Events, ReadersThatLeaveBeforeAnyEventAreForgotten) {
+    class Reader : public velt::host::EventReader {
+    public:
+        void deliver(const std::shared_ptr<const std::string>& event) override { last = *event; }
+        std::string last;
+    };
+    velt::host::EventHub hub;
+    const auto stays = std::make_shared<Reader>();
+    hub.add(stays);
+    const std::weak_ptr<Reader> leaves = [&hub] {
+        const auto reader = std::make_shared<Reader>();
+        hub.add(reader);
+        EXPECT_EQ(hub.readers(), 2U);
+        return reader;
+    }();
+    EXPECT_TRUE(leaves.expired());
+    const auto next = std::make_shared<Reader>();
+    hub.add(next);
+    EXPECT_EQ(leaves.use_count(), 0);
+    EXPECT_EQ(hub.readers(), 2U);
+    hub.publish("type", Json::Value(7));
+    EXPECT_EQ(stays->last, "event: type\ndata: 7\n\n");
+    EXPECT_EQ(next->last, stays->last);
+}
+
+TEST_F(HostEvents, StreamsOfEventsAreCounted) {
+    start();
+    EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 0\n"), std::string::npos);
+    const Client events = listen();
+    EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 1\n"), std::string::npos);
+}
+
+TEST_F(HostEvents, AReaderThatLagsIsLeftBehind) {
+    limits.queuedEvents = 50'000;
+    start();
+    const Client events = listen();
+    const int small = 4096;
+    setsockopt(events.descriptor(), SOL_SOCKET, SO_RCVBUF, &small, sizeof small);
+    LogEntry entry;
+    entry.sentence = std::string(10'000, 'x');
+    for (int i = 0; i < 1000 && server->connections() > 0; ++i) {
+        access.logSubscriber(entry);
+        std::this_thread::sleep_for(milliseconds(1));
+    }
+    for (int i = 0; i < 300 && server->connections() > 0; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+    }
+    EXPECT_EQ(server->connections(), 0U);
+}
+
+TEST_F(HostEvents, AStopEndsStreamsAndIdleConnectionsAtOnce) {
+    start();
+    Client events = listen();
+    Client idle = connect();
+    EXPECT_EQ(idle.ask(requestText("GET", "/healthz", admin)).status, 200);
+    const auto begin = std::chrono::steady_clock::now();
+    stop();
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3));
+    EXPECT_TRUE(events.ended());
+    EXPECT_TRUE(idle.ended());
+    EXPECT_FALSE(Client::unixSocket(socketPath).connected());
+    EXPECT_FALSE(std::filesystem::exists(socketPath));
+}
+
+} // namespace

@@ -1,0 +1,228 @@
+// The description of the API against the module's table, its decisions and its answers.
+
+#include "host/api/openapi.h"
+#include "host/base/json.h"
+#include "tests/host/fake_standalone.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+#include <valijson/adapters/jsoncpp_adapter.hpp>
+#include <valijson/schema.hpp>
+#include <valijson/schema_parser.hpp>
+#include <valijson/validator.hpp>
+
+#include <algorithm>
+#include <cctype>
+#include <set>
+
+namespace {
+
+using valijson::adapters::JsonCppAdapter;
+
+const std::string ftp = "VELT.Core.FileServ.FTP";
+
+/// Why the value is not as the schema says; "" when it is.
+std::string violation(const Json::Value& schema, const Json::Value& value) {
+    valijson::Schema compiled;
+    valijson::SchemaParser().populateSchema(JsonCppAdapter(schema), compiled);
+    valijson::Validator validator(valijson::Validator::kStrongTypes);
+    valijson::ValidationResults results;
+    validator.validate(compiled, JsonCppAdapter(value), &results);
+    std::string text;
+    for (const auto& error : results) {
+        text += error.context.back() + ": " + error.description + "\n";
+    }
+    return text;
+}
+
+class OpenApiTest : public HostTest {
+protected:
+    void SetUp() override {
+        platform.reset();
+        FakeStandalone::instance() = {};
+        settings.workers = 1;
+        start();
+        document = get("/openapi.json").json();
+    }
+
+    static std::string pathOf(const velt::host::Row& row) {
+        return "/api/" + row.api + "/v" + std::to_string(row.version) + "/" + row.method;
+    }
+
+    Json::Value answerSchema(const std::string& path, const char* method = "post") const {
+        return resolved(
+            document["paths"][path][method]["responses"]["200"]["content"]["application/json"]["schema"]);
+    }
+
+    /// The schema with those that it refers to in their places.
+    Json::Value resolved(const Json::Value& schema) const {
+        if (schema.isObject() && schema.isMember("$ref")) {
+            std::string path = schema["$ref"].asString().substr(1);
+            std::replace(path.begin(), path.end(), '/', '.');
+            const Json::Value& target = Json::Path(path).resolve(document);
+            EXPECT_TRUE(target.isObject()) << path;
+            return resolved(target);
+        }
+        Json::Value copy = schema;
+        for (Json::Value& each : copy) {
+            each = resolved(each);
+        }
+        return copy;
+    }
+
+    /// Every value that a parameter is tried with, right and wrong.
+    static std::vector<Json::Value> values() {
+        std::vector<Json::Value> all;
+        for (const char* text :
+             {"null", "true", "false", "0", "1", "2", "3", "-1", "65535", "65536", "2147483648", "1.5",
+              "\"\"", "\"x\"", "\"50000:50010\"", "[]", "[\"bob\"]", "[1]", "{}"}) {
+            all.push_back(velt::host::parseObject(R"({"v":)" + std::string(text) + "}").value["v"]);
+        }
+        return all;
+    }
+
+    fake::Platform& platform = fake::Platform::instance();
+    Json::Value document;
+};
+
+TEST_F(OpenApiTest, EveryRowIsOnePathAndNoOther) {
+    std::set<std::string> rows;
+    for (const auto* row : table->rows()) {
+        const std::string path = pathOf(*row);
+        rows.insert(path);
+        const Json::Value& item = document["paths"][path];
+        EXPECT_TRUE(item["post"].isObject()) << path;
+        EXPECT_EQ(item["get"].isObject(), row->callableByGet()) << path;
+    }
+    for (const std::string& path : document["paths"].getMemberNames()) {
+        if (path.find("/v") != std::string::npos) {
+            EXPECT_TRUE(rows.contains(path)) << path;
+        }
+    }
+}
+
+TEST_F(OpenApiTest, EveryOtherPathIsServedAsDescribed) {
+    velt::LogEntry entry;
+    entry.event = 0x11B00012;
+    FakeStandalone::instance().log = {entry};
+    FakeStandalone::instance().down = {{"ftp", "No luck.", false}};
+    for (const std::string& path : document["paths"].getMemberNames()) {
+        if (path.find("/v") != std::string::npos || path == "/events") {
+            continue;
+        }
+        for (const std::string& method : document["paths"][path].getMemberNames()) {
+            std::string upper = method;
+            std::transform(upper.begin(), upper.end(), upper.begin(),
+                           [](unsigned char c) { return static_cast<char>(std::toupper(c)); });
+            const Answer answer = ask(upper, path, admin);
+            const std::string status = std::to_string(answer.status);
+            EXPECT_TRUE(document["paths"][path][method]["responses"].isMember(status))
+                << upper << " " << path << " " << status;
+            if (answer.status == 200 && path != "/metrics" && path != "/openapi.json") {
+                EXPECT_EQ(violation(answerSchema(path, method.c_str()), answer.json()), "") << path;
+            }
+        }
+    }
+}
+
+TEST_F(OpenApiTest, RealAnswersAreAsDescribed) {
+    platform.shares["public"] = {"", "/", 1};
+    platform.ftpShares = {"public"};
+    platform.users["bob"] = {"Bob", 1000};
+    platform.chrootUsers = {"bob"};
+    platform.rules = {"user:1000:/public"};
+    const std::map<std::string, std::string> parameters{{"list", R"({"chroot":true})"},
+                                                        {"add", R"({"id":["eve"]})"}};
+    int answers = 0;
+    for (const auto* row : table->rows()) {
+        const std::string path = pathOf(*row);
+        const Json::Value schema = answerSchema(path);
+        const auto given = parameters.find(row->method);
+        if (!row->reads() && given == parameters.end()) {
+            EXPECT_TRUE(document["paths"][path]["post"]["responses"].isMember("204")) << path;
+            continue;
+        }
+        const Answer answer = post(path, given == parameters.end() ? "" : given->second);
+        EXPECT_EQ(answer.status, 200) << path;
+        EXPECT_EQ(violation(schema, answer.json()), "") << path;
+        ++answers;
+    }
+    EXPECT_EQ(answers, 9);
+}
+
+TEST_F(OpenApiTest, AnAnswerWithAnotherVersionsKeyWouldBeNoticed) {
+    const Json::Value second = post("/api/" + ftp + "/v2/get").json();
+    EXPECT_EQ(violation(answerSchema("/api/" + ftp + "/v2/get"), second), "");
+    EXPECT_NE(violation(answerSchema("/api/" + ftp + "/v1/get"), second), "");
+    EXPECT_NE(violation(answerSchema("/api/" + ftp + "/v3/get"), second), "");
+}
+
+TEST_F(OpenApiTest, ProblemsAreAsDescribed) {
+    const Json::Value schema = resolved(document["components"]["schemas"]["Problem"]);
+    FakeStandalone::instance().down = {{"ftp", "No luck.", true}};
+    EXPECT_EQ(violation(schema, post("/api/" + ftp + ".SFTP/v1/set", R"({"enable":true})").json()), "");
+    EXPECT_EQ(violation(schema, get("/api/log?limit=x").json()), "");
+    EXPECT_EQ(violation(schema, get("/nowhere").json()), "");
+    EXPECT_EQ(violation(schema, post("/api/" + ftp + "/v3/set", "{}").json()), "");
+    EXPECT_EQ(violation(schema, ask("GET", "/api").json()), "");
+}
+
+/// Where the module says 1901, the description says what is wrong; where it accepts, the description does
+/// too.
+TEST_F(OpenApiTest, TheDescriptionAgreesWithTheModuleOnEveryParameter) {
+    const std::map<std::string, std::string> required{{"set", R"({"enable_ftp":true,"enable_ftps":true})"},
+                                                      {"list", R"({"chroot":true})"}};
+    const velt::host::OpenApi description;
+    int refused = 0;
+    int accepted = 0;
+    for (const auto* row : table->rows()) {
+        const std::string path = pathOf(*row);
+        const Json::Value& body = document["paths"][path]["post"]["requestBody"]["content"];
+        const Json::Value& properties = body["application/json"]["schema"]["properties"];
+        Json::Value base(Json::objectValue);
+        if (row->method == "set" && row->api == ftp) {
+            base = velt::host::parseObject(required.at("set")).value;
+        } else if (row->method == "list") {
+            base = velt::host::parseObject(required.at("list")).value;
+        } else if (row->api == ftp + ".SFTP" && row->method == "set") {
+            base["enable"] = true;
+        }
+        for (const std::string& name : properties.getMemberNames()) {
+            for (const Json::Value& value : values()) {
+                Json::Value parameters = base;
+                parameters[name] = value;
+                platform.reset();
+                const Answer answer = post(path, velt::host::toJson(parameters));
+                const bool says = answer.status == 422;
+                (says ? refused : accepted) += 1;
+                if (row->method == "save") {
+                    // Rules that are no list the module takes for none: the description says so in words.
+                    EXPECT_FALSE(says) << velt::host::toJson(parameters) << " " << answer.body;
+                } else if (answer.status != 500) {
+                    EXPECT_EQ(says, !description.explain(*row, parameters).empty())
+                        << path << " " << velt::host::toJson(parameters) << " " << answer.body;
+                }
+                if (says) {
+                    EXPECT_GT(answer.json()["errors"].size(), 0U) << path << answer.body;
+                }
+            }
+        }
+    }
+    EXPECT_GT(refused, 300);
+    EXPECT_GT(accepted, 100);
+}
+
+TEST_F(OpenApiTest, EachRequiredKeyIsRequired) {
+    for (const auto* row : table->rows()) {
+        const std::string path = pathOf(*row);
+        const Json::Value& schema =
+            document["paths"][path]["post"]["requestBody"]["content"]["application/json"]["schema"];
+        const Answer answer = post(path, "{}");
+        EXPECT_EQ(answer.status == 422, schema.isMember("required")) << path;
+        if (answer.status == 422) {
+            EXPECT_EQ(answer.json()["errors"].size(), schema["required"].size()) << path << answer.body;
+        }
+    }
+}
+
+} // namespace

@@ -1,0 +1,184 @@
+// What the host tells about the services, and that it never says "done" while one that is switched on is
+// down.
+
+#include "tests/host/fake_standalone.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+namespace {
+
+const std::string ftp = "/api/VELT.Core.FileServ.FTP/v";
+const std::string chroot = "/api/VELT.Core.FileServ.FTP.ChrootUser/v";
+const std::string sftp = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
+const velt::ServiceDown ftpDown{"ftp", "The FTP daemon does not start: no luck.", false};
+
+class HostServices : public HostTest {
+protected:
+    void SetUp() override {
+        platform.reset();
+        access = {};
+        settings.workers = 1; // the fake platform knows one thread
+        start();
+    }
+
+    /// Whether the line is in the metrics.
+    bool measured(const std::string& line) const {
+        return ("\n" + get("/metrics").body).find("\n" + line + "\n") != std::string::npos;
+    }
+
+    fake::Platform& platform = fake::Platform::instance();
+    FakeStandalone& access = FakeStandalone::instance();
+};
+
+TEST_F(HostServices, AChangeIsNotDoneWhileAServiceIsDown) {
+    access.down = {ftpDown};
+    // The first finds something to change, the second does not.
+    for (int i = 1; i <= 2; ++i) {
+        const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+        EXPECT_EQ(answer.status, 500);
+        EXPECT_EQ(answer.header("content-type"), "application/problem+json");
+        const Json::Value problem = answer.json();
+        EXPECT_FALSE(problem.isMember("code")) << "the module has accepted it";
+        EXPECT_EQ(problem["title"], "A service that is switched on does not run");
+        EXPECT_EQ(
+            problem["detail"],
+            "What was asked for is stored, but a service does not follow. The FTP service does not run. The "
+            "FTP daemon does not start: no luck.");
+        EXPECT_EQ(problem["down"][0]["service"], "ftp");
+        EXPECT_EQ(problem["changed"], i == 1);
+        EXPECT_EQ(access.starts, i) << "each change tries to start it";
+        EXPECT_TRUE(
+            logged("request=" + problem["request_id"].asString() + " The FTP service does not run. The FTP"));
+    }
+    EXPECT_TRUE(measured(
+        R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="service_down",version="1"} 2)"));
+}
+
+TEST_F(HostServices, AChangeThatGetsTheServiceUpIsDone) {
+    access.down = {ftpDown};
+    access.startHelps = true;
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true})").status, 204);
+    EXPECT_EQ(access.starts, 1);
+    EXPECT_EQ(access.actor, "admin");
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true})").status, 204);
+    EXPECT_EQ(access.starts, 1) << "nothing is started when all is well";
+}
+
+TEST_F(HostServices, AServiceWithFormerSettingsIsNotDoneEither) {
+    access.down = {{"sftp", "The configuration was refused.", true}};
+    const Answer answer = post(chroot + "1/add", R"({"id":["eve"]})");
+    EXPECT_EQ(answer.status, 500);
+    EXPECT_EQ(
+        answer.json()["detail"],
+        "What was asked for is stored, but a service does not follow. The SFTP service runs with its former "
+        "settings. The configuration was refused.");
+}
+
+TEST_F(HostServices, ReadsAndRefusalsStartNothing) {
+    access.down = {ftpDown};
+    EXPECT_EQ(get(sftp + "get").status, 200);
+    EXPECT_EQ(get("/api/status").status, 200);
+    EXPECT_EQ(post(sftp + "set", "{}").status, 422);
+    EXPECT_EQ(access.starts, 0);
+}
+
+TEST_F(HostServices, HealthNamesWhatIsDown) {
+    EXPECT_EQ(get("/healthz").body, R"({"status":"ok"})");
+    access.down = {ftpDown};
+    const Answer answer = get("/healthz");
+    EXPECT_EQ(answer.status, 200) << "the host itself is well";
+    EXPECT_EQ(answer.body, R"({"down":[{"reason":"The FTP daemon does not start: no luck.",)"
+                           R"("serves_former_settings":false,"service":"ftp"}],"status":"degraded"})");
+}
+
+TEST_F(HostServices, StatusAndMetricsTellWhatIsSwitchedOnButDown) {
+    platform.services["ftpd"] = 1;
+    platform.conf.service_flags = 1;
+    platform.sftp.enable = 1;
+    platform.sftpAlive = 0;
+    access.down = {ftpDown, {"sftp", "The SFTP daemon is paused.", false}};
+    const Json::Value services = get("/api/status").json()["services"];
+    EXPECT_EQ(services[0]["enabled"], true);
+    EXPECT_EQ(services[0]["running"], false);
+    EXPECT_EQ(services[0]["reason"], "The FTP daemon does not start: no luck.");
+    EXPECT_EQ(services[1]["running"], false);
+    EXPECT_FALSE(services[1].isMember("reason")) << "FTPS is off and shall be";
+    EXPECT_EQ(services[2]["wanted"], true);
+    EXPECT_EQ(services[2]["running"], false);
+    EXPECT_EQ(services[2]["reason"], "The SFTP daemon is paused.");
+    EXPECT_TRUE(measured(R"(velt_service_enabled{service="ftp"} 1)"));
+    EXPECT_TRUE(measured(R"(velt_service_up{service="ftp"} 0)"));
+    EXPECT_TRUE(measured(R"(velt_service_enabled{service="sftp"} 1)"));
+    EXPECT_TRUE(measured(R"(velt_service_up{service="sftp"} 0)"));
+    access.down[0].servesFormerSettings = true;
+    EXPECT_EQ(get("/api/status").json()["services"][0]["running"], true);
+    EXPECT_TRUE(measured(R"(velt_service_up{service="ftp"} 1)"));
+}
+
+TEST_F(HostServices, SettingsThatCannotBeReadAreNotHidden) {
+    platform.fail("VELTFTPConfGet", 1); // of the stored switches
+    platform.fail("VELTFTPConfGet", 2); // of the module
+    access.down = {{"ftp", "The file ftp.conf, line 1, is damaged.", false}};
+    const Json::Value services = get("/api/status").json()["services"];
+    ASSERT_EQ(services.size(), 3U);
+    EXPECT_TRUE(services[0]["enabled"].isNull());
+    EXPECT_TRUE(services[0]["port"].isNull());
+    EXPECT_EQ(services[0]["running"], false);
+    EXPECT_EQ(services[0]["reason"], "The file ftp.conf, line 1, is damaged.");
+}
+
+TEST_F(HostServices, RestartsOfCrashedDaemonsAreCounted) {
+    access.restarts = {{"ftpd", 2}, {"sftp", 0}};
+    EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 2)"));
+    EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="sftp"} 0)"));
+    access.restarts["ftpd"] = 3;
+    EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 3)"));
+    EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 3)")) << "none is counted twice";
+    access.restarts["ftpd"] = 1;
+    EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 4)"))
+        << "counted anew, by a new supervisor";
+}
+
+TEST_F(HostServices, StatusComesFromTheModulesAnswers) {
+    platform.services["ftpd"] = 1;
+    platform.sftp.port = 2022;
+    const Json::Value status = get("/api/status").json();
+    EXPECT_EQ(status["services"][0]["name"], "ftp");
+    EXPECT_EQ(status["services"][0]["enabled"], true);
+    EXPECT_EQ(status["services"][0]["port"], 21);
+    EXPECT_EQ(status["services"][1]["enabled"], false);
+    EXPECT_EQ(status["services"][2]["name"], "sftp");
+    EXPECT_EQ(status["services"][2]["port"], 2022);
+    EXPECT_EQ(get("/healthz").json()["status"], "ok");
+}
+
+TEST_F(HostServices, StatusTellsWhatIsStoredBesideWhatRuns) {
+    platform.conf.service_flags = 2;
+    platform.sftp.enable = 1;
+    platform.sftpAlive = 0;
+    const Json::Value services = get("/api/status").json()["services"];
+    EXPECT_EQ(services[0]["wanted"], false);
+    EXPECT_EQ(services[1]["wanted"], true);
+    EXPECT_EQ(services[1]["enabled"], false);
+    EXPECT_EQ(services[2]["wanted"], true);
+    EXPECT_EQ(services[2]["enabled"], false);
+}
+
+TEST_F(HostServices, MetricsCountRequestsByRowAndOutcome) {
+    platform.services["ftpd"] = 1;
+    get(ftp + "3/get");
+    post(sftp + "set", "{}");
+    post(sftp + "set", R"({"enable":true})");
+    const std::string text = get("/metrics").body;
+    for (
+        const char* line :
+        {R"(velt_requests_total{api="VELT.Core.FileServ.FTP",method="get",outcome="success",version="3"} 1)",
+         R"(velt_requests_total{api="VELT.Core.FileServ.FTP.SFTP",method="set",outcome="1901",version="1"} 1)",
+         R"(velt_service_up{service="ftp"} 1)", R"(velt_service_up{service="ftps"} 0)",
+         R"(velt_service_up{service="sftp"} 1)", R"(velt_daemon_starts_total{service="sftp"} 1)",
+         "velt_request_duration_seconds_bucket"}) {
+        EXPECT_NE(text.find(line), std::string::npos) << line << "\n" << text;
+    }
+}
+
+} // namespace

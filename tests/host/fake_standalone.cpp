@@ -1,0 +1,178 @@
+#include "tests/host/fake_standalone.h"
+
+#include "tests/support/fake_platform/fake_platform.h"
+
+#include <algorithm>
+#include <mutex>
+#include <set>
+#include <utility>
+
+namespace {
+
+using velt::Effect;
+
+/// Modules of the tests' own are called on several threads; those that call the fake platform are not.
+std::mutex mutex;
+
+/// The calling thread's request.
+struct Request {
+    velt::EffectReport report;
+    std::size_t journalStart = 0;
+    std::string sentence = "The last error is that of an earlier request.";
+};
+
+Request& request() {
+    thread_local Request instance;
+    return instance;
+}
+
+/// The effect that an operation of the contract has, if it has one.
+std::optional<Effect> effectOf(const std::string& operation) {
+    static const std::set<std::string> storing{
+        "VELTFTPConfSet",         "VELTFTPTimeOutSet",      "VELTFTPUseUTF8Set",    "VELTFTPFIPSEnabledSet",
+        "VELTFTPASCIIEnabledSet", "VELTFTPUmaskEnabledSet", "VELTFTPAddChrootUser", "VELTFTPDeleteChrootUser",
+        "VELTFTPChrootRuleSave",  "VELTSFTPConfigSet",      "VLIBCINFOSetKeyValue"};
+    static const std::map<std::string, Effect> others{{"VLIBServiceStart", Effect::start},
+                                                      {"VLIBServiceStop", Effect::stop},
+                                                      {"VLIBServicecfgRunKeySet", Effect::runKey},
+                                                      {"VELTLogSet1", Effect::logEntry},
+                                                      {"VLIBSyseventEmit", Effect::event}};
+    if (storing.contains(operation)) {
+        return Effect::store;
+    }
+    const auto found = others.find(operation);
+    return found == others.end() ? std::nullopt : std::optional(found->second);
+}
+
+void tellSubscribers(Effect effect) {
+    FakeStandalone& fake = FakeStandalone::instance();
+    if (effect == Effect::logEntry) {
+        velt::LogEntry entry;
+        entry.id = static_cast<std::int64_t>(fake.log.size()) + 1;
+        entry.actor = fake.actor;
+        entry.address = fake.address;
+        fake.log.push_back(entry);
+        if (fake.logSubscriber) {
+            fake.logSubscriber(entry);
+        }
+    } else if (effect == Effect::event && fake.eventSubscriber) {
+        fake.announce("ftpd", "start");
+    }
+}
+
+/// Tells of all that the request has done, at its end.
+void reportEffects(const Request& ended) {
+    const auto& journal = fake::Platform::instance().journal;
+    for (std::size_t i = ended.journalStart; i < journal.size(); ++i) {
+        if (const auto effect = effectOf(fake::Platform::operationOf(journal[i]))) {
+            ended.report(*effect, "sftp", 0, {});
+            tellSubscribers(*effect);
+        }
+    }
+    if (FakeStandalone::instance().storeFails) {
+        ended.report(Effect::store, "settings", -1, {});
+    }
+}
+
+} // namespace
+
+FakeStandalone& FakeStandalone::instance() {
+    static FakeStandalone fake;
+    return fake;
+}
+
+void FakeStandalone::announce(const std::string& service, const std::string& action) const {
+    velt::SystemEvent event;
+    event.name = "velt.service.action";
+    event.parameters = {{"SERVICE_NAME", service}, {"SERVICE_ACTION", action}};
+    eventSubscriber(event);
+}
+
+namespace velt {
+
+int startEnabledServices() {
+    FakeStandalone& fake = FakeStandalone::instance();
+    ++fake.starts;
+    if (fake.startHelps) {
+        fake.down.clear();
+    }
+    return fake.down.empty() ? 0 : -1;
+}
+
+std::vector<ServiceDown> servicesDown() {
+    return FakeStandalone::instance().down;
+}
+
+std::uint64_t daemonRestarts(const std::string& service) {
+    return FakeStandalone::instance().restarts[service];
+}
+
+void clearLastError() {
+    request().sentence = FakeStandalone::instance().sentence;
+}
+
+const std::string& lastErrorSentence() {
+    return request().sentence;
+}
+
+PortConflict lastPortConflict() {
+    return FakeStandalone::instance().conflict;
+}
+
+// Between requests it is the system's turn, which no test looks at.
+void setRequestActor(const std::string& actor, const std::string& address) {
+    const std::lock_guard lock(mutex);
+    if (!actor.empty()) {
+        FakeStandalone::instance().actor = actor;
+        FakeStandalone::instance().address = address;
+    }
+}
+
+void setEffectReport(EffectReport report) {
+    const std::lock_guard lock(mutex);
+    const Request ended = std::exchange(
+        request(), {std::move(report), fake::Platform::instance().journal.size(), request().sentence});
+    if (ended.report) {
+        reportEffects(ended);
+    }
+}
+
+Subscription subscribeEvents(EventSubscriber subscriber) {
+    FakeStandalone::instance().eventSubscriber = std::move(subscriber);
+    return 1;
+}
+
+Subscription subscribeLog(LogSubscriber subscriber) {
+    FakeStandalone::instance().logSubscriber = std::move(subscriber);
+    return 2;
+}
+
+void unsubscribe(Subscription subscription) {
+    if (subscription == 1) {
+        FakeStandalone::instance().eventSubscriber = nullptr;
+    } else {
+        FakeStandalone::instance().logSubscriber = nullptr;
+    }
+}
+
+std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
+    FakeStandalone& fake = FakeStandalone::instance();
+    fake.largestLimit = std::max(fake.largestLimit, filter.limit);
+    if (fake.logFails) {
+        request().sentence = fake.sentence;
+        return std::nullopt;
+    }
+    std::vector<LogEntry> found;
+    for (auto entry = fake.log.rbegin(); entry != fake.log.rend(); ++entry) {
+        const bool wanted = (!filter.since || entry->time >= *filter.since) &&
+                            (!filter.event || entry->event == *filter.event) &&
+                            (!filter.actor || entry->actor == *filter.actor) &&
+                            (!filter.beforeId || entry->id < *filter.beforeId);
+        if (wanted && found.size() < static_cast<std::size_t>(filter.limit)) {
+            found.push_back(*entry);
+        }
+    }
+    return found;
+}
+
+} // namespace velt

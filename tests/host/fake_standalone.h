@@ -1,0 +1,35 @@
+// What the platform library offers a host, over the fake platform.
+#ifndef VELT_TESTS_HOST_FAKE_STANDALONE_H
+#define VELT_TESTS_HOST_FAKE_STANDALONE_H
+
+#include "standalone/standalone.h"
+
+#include <cstdint>
+#include <map>
+#include <string>
+#include <vector>
+
+/// What a test sets up and looks at, while no request runs.
+struct FakeStandalone {
+    velt::EventSubscriber eventSubscriber;
+    velt::LogSubscriber logSubscriber;
+    std::vector<velt::LogEntry> log; ///< oldest first
+    int largestLimit = 0;            ///< that the log was asked for
+    bool logFails = false;           ///< with `sentence`
+    std::string sentence;            ///< of the last error of the requests to come
+    velt::PortConflict conflict;     ///< that is found
+    bool storeFails = false;
+    std::vector<velt::ServiceDown> down; ///< services that are switched on and do not run
+    bool startHelps = false;             ///< and run once they are started
+    int starts = 0;                      ///< how often the host started what is switched on
+    std::map<std::string, std::uint64_t> restarts;
+    std::string actor; ///< of the last request
+    std::string address;
+
+    static FakeStandalone& instance();
+
+    /// Announces that the service was started, stopped, ...
+    void announce(const std::string& service, const std::string& action) const;
+};
+
+#endif

@@ -1,0 +1,238 @@
+// Requests that are too large, too slow or too many.
+
+#include "host/base/open_file_limit.h"
+#include "tests/host/fake_standalone.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <deque>
+#include <thread>
+
+namespace {
+
+using std::chrono::milliseconds;
+
+const std::string target = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
+
+class HostLimits : public HostTest {
+protected:
+    void SetUp() override {
+        fake::Platform::instance().reset();
+        FakeStandalone::instance() = {};
+        settings.workers = 1;
+    }
+};
+
+TEST_F(HostLimits, AHeadMayBeAsLargeAsTheLimit) {
+    start();
+    const std::string small = requestText("GET", "/healthz", admin + "X-Pad: \r\n");
+    const std::size_t room = limits.head - small.size();
+    const auto padded = [this](std::size_t size) {
+        Client client = connect();
+        return client.ask(
+            requestText("GET", "/healthz", admin + "X-Pad: " + std::string(size, 'a') + "\r\n"));
+    };
+    EXPECT_EQ(padded(room).status, 200);
+    EXPECT_EQ(padded(room + 1).status, 431);
+}
+
+TEST_F(HostLimits, AHugeHeadIsRefusedAlthoughItGoesOn) {
+    start();
+    Client client = connect();
+    client.send("GET /healthz HTTP/1.1\r\n");
+    const std::string line = "X-Pad: " + std::string(1000, 'a') + "\r\n";
+    for (int i = 0; i < 200 && client.send(line); ++i) {
+    }
+    EXPECT_EQ(client.receive().status, 431);
+    EXPECT_TRUE(client.ended());
+}
+
+TEST_F(HostLimits, ABodyMayBeAsLargeAsTheLimit) {
+    start();
+    const std::string json = R"({"enable":true})";
+    EXPECT_EQ(post(target + "set", json + std::string(limits.body - json.size(), ' ')).status, 204);
+    const Answer large = post(target + "set", json + std::string(limits.body - json.size() + 1, ' '));
+    EXPECT_EQ(large.status, 413);
+    EXPECT_EQ(large.header("content-type"), "application/problem+json");
+}
+
+TEST_F(HostLimits, AHugeChunkedBodyIsRefused) {
+    limits.body = 10'000;
+    start();
+    Client client = connect();
+    client.send("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +
+                "Transfer-Encoding: chunked\r\n\r\n");
+    const std::string chunk = "3e8\r\n" + std::string(1000, ' ') + "\r\n";
+    for (int i = 0; i < 100 && client.send(chunk); ++i) {
+    }
+    EXPECT_EQ(client.receive().status, 413);
+}
+
+TEST_F(HostLimits, ASlowHeadTimesOut) {
+    limits.headTime = milliseconds(200);
+    start();
+    Client client = connect();
+    client.send("GET /healthz HTTP/1.1\r\nHost: ");
+    const Answer answer = client.receive();
+    EXPECT_EQ(answer.status, 408);
+    EXPECT_EQ(answer.json()["status"], 408);
+    EXPECT_TRUE(client.ended());
+}
+
+TEST_F(HostLimits, ATrickledHeadTimesOut) {
+    limits.headTime = milliseconds(300);
+    start();
+    Client client = connect();
+    const auto begin = std::chrono::steady_clock::now();
+    for (int i = 0; i < 100 && client.send("G"); ++i) {
+        std::this_thread::sleep_for(milliseconds(20));
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(2500));
+    EXPECT_EQ(client.receive().status, 408);
+}
+
+TEST_F(HostLimits, ASlowBodyTimesOut) {
+    limits.bodyTime = milliseconds(200);
+    start();
+    Client client = connect();
+    client.send("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +
+                "Content-Length: 100\r\n\r\n{");
+    EXPECT_EQ(client.receive().status, 408);
+    EXPECT_TRUE(client.ended());
+}
+
+TEST_F(HostLimits, AnIdleConnectionEndsWithoutAnAnswer) {
+    limits.idleTime = milliseconds(200);
+    start();
+    Client fresh = connect();
+    EXPECT_EQ(fresh.receive().status, 0);
+    Client used = connect();
+    EXPECT_EQ(used.ask(requestText("GET", "/healthz", admin)).status, 200);
+    EXPECT_EQ(used.receive().status, 0);
+}
+
+TEST_F(HostLimits, AClientThatTakesNoAnswersIsLeft) {
+    limits.writeTime = milliseconds(300);
+    start();
+    const Client client = connect();
+    const std::string request = requestText("GET", "/openapi.json", admin);
+    // Their answers do not fit into the buffers between the two.
+    for (int i = 0; i < 300; ++i) {
+        if (!client.send(request)) {
+            break;
+        }
+    }
+    for (int i = 0; i < 500 && server->connections() > 0; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+    }
+    EXPECT_EQ(server->connections(), 0U);
+}
+
+TEST_F(HostLimits, ConnectionsBeyondTheLimitAreToldSo) {
+    limits.connections = 5;
+    start();
+    std::deque<Client> open;
+    while (server->connections() > 0) {
+        std::this_thread::sleep_for(milliseconds(5));
+    }
+    for (int i = 0; i < 5; ++i) {
+        open.push_back(connect());
+        EXPECT_EQ(open.back().ask(requestText("GET", "/healthz", admin)).status, 200);
+    }
+    Client more = connect();
+    EXPECT_EQ(more.receive().status, 503);
+    EXPECT_TRUE(more.ended());
+    open.pop_front();
+    Answer answer;
+    for (int i = 0; i < 200 && answer.status != 200; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+        answer = get("/healthz");
+    }
+    EXPECT_EQ(answer.status, 200);
+}
+
+TEST_F(HostLimits, WhoOnlyConnectsGivesWay) {
+    limits.connections = 5;
+    start();
+    Client trusted = connect();
+    EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200);
+    std::deque<Client> idle;
+    for (int i = 0; i < 20; ++i) {
+        idle.push_back(connect());
+        idle.back().send(i % 2 == 0 ? "" : "GET /heal");
+    }
+    EXPECT_EQ(get("/healthz").status, 200);
+    EXPECT_TRUE(idle.front().ended()) << "the oldest goes first";
+    EXPECT_EQ(idle.back().ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
+    EXPECT_EQ(trusted.ask(requestText("GET", "/healthz", admin)).status, 200) << "one with access stays";
+    EXPECT_LE(server->connections(), 6U);
+}
+
+TEST_F(HostLimits, ManyWrongTokensKeepNobodyOut) {
+    limits.connections = 100;
+    limits.delayedRefusals = 10;
+    limits.refusalDelay = std::chrono::seconds(3);
+    start();
+    const auto begin = std::chrono::steady_clock::now();
+    std::deque<Client> guesses;
+    for (int i = 0; i < 300; ++i) {
+        guesses.push_back(connect());
+        guesses.back().send(requestText("GET", "/healthz", "Authorization: Bearer guess\r\n"));
+    }
+    EXPECT_EQ(get("/healthz").status, 200);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+    int refused = 0;
+    for (Client& guess : guesses) {
+        const int status = guess.receive().status;
+        EXPECT_TRUE(status == 401 || status == 0) << status;
+        refused += status == 401;
+    }
+    EXPECT_GE(refused, 100) << "who gave way got no answer, the others did";
+    EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3)) << "those that wait do wait";
+}
+
+TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
+    // Of this test there are as many descriptors as of the host.
+    ASSERT_EQ(velt::host::makeRoomForConnections(2000), 2000U) << "the test needs more descriptors";
+    limits.connections = 1010;
+    start();
+    std::deque<Client> idle;
+    for (int i = 0; i < 1000; ++i) {
+        idle.push_back(connect());
+        ASSERT_TRUE(idle.back().connected());
+        // Half of them have begun a request.
+        if (i % 2 == 0) {
+            idle.back().send("GET /heal");
+        }
+    }
+    const auto begin = std::chrono::steady_clock::now();
+    Client client = connect();
+    for (int i = 0; i < 100; ++i) {
+        ASSERT_EQ(client.ask(requestText("GET", target + "get", admin)).status, 200);
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+    EXPECT_EQ(idle[0].ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
+    const auto end = std::chrono::steady_clock::now();
+    stop();
+    EXPECT_LT(std::chrono::steady_clock::now() - end, std::chrono::seconds(5));
+}
+
+/// Never returns: a hard limit that was lowered does not rise again.
+[[noreturn]] void tryTightLimits() {
+    const rlimit tight = {100, 1000};
+    setrlimit(RLIMIT_NOFILE, &tight);
+    const bool small = velt::host::makeRoomForConnections(500) == 500;
+    const bool large = velt::host::makeRoomForConnections(5000) == 1000 - 256;
+    rlimit now{};
+    getrlimit(RLIMIT_NOFILE, &now);
+    _exit(small && large && now.rlim_cur == 1000 ? 0 : 1);
+}
+
+TEST(Descriptors, AreAsManyAsTheLimitAllows) {
+    EXPECT_EXIT(tryTightLimits(), testing::ExitedWithCode(0), "");
+}
+
+} // namespace

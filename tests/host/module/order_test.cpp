@@ -1,0 +1,166 @@
+// Reads side by side, writes alone: with many clients, and of the order itself.
+
+#include "host/module/request_order.h"
+#include "tests/host/fake_standalone.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+
+#include <atomic>
+#include <future>
+#include <thread>
+
+namespace {
+
+using std::chrono::milliseconds;
+using velt::host::RequestOrder;
+using Kind = RequestOrder::Kind;
+
+class HostOrder : public HostTest {
+protected:
+    void SetUp() override {
+        fake::Platform::instance().reset();
+        FakeStandalone::instance() = {};
+        modules = {COUNTING_MODULE};
+    }
+
+    /// The number of requests that got the wanted status, of `count` over one connection.
+    int repeat(const std::string& method, int count, int status) const {
+        Client client = connect();
+        int good = 0;
+        for (int i = 0; i < count; ++i) {
+            good +=
+                client.ask(requestText("POST", "/api/VELT.Test.Order/v1/" + method, admin)).status == status;
+        }
+        return good;
+    }
+};
+
+TEST_F(HostOrder, TwoWritersAndManyReaders) {
+    start();
+    std::atomic<int> good{0};
+    std::vector<std::thread> clients;
+    clients.reserve(10);
+    for (int i = 0; i < 2; ++i) {
+        clients.emplace_back([&] { good += repeat("set", 40, 204); });
+    }
+    for (int i = 0; i < 8; ++i) {
+        clients.emplace_back([&] { good += repeat("get", 40, 200); });
+    }
+    for (std::thread& client : clients) {
+        client.join();
+    }
+    EXPECT_EQ(good, 400);
+    const Json::Value seen = get("/api/VELT.Test.Order/v1/get").json();
+    EXPECT_EQ(seen["value"], 80);
+    EXPECT_EQ(seen["writers"], 1);
+    EXPECT_GT(seen["readers"].asInt(), 1);
+    EXPECT_EQ(seen["torn"], false);
+    EXPECT_EQ(seen["mixed"], false);
+}
+
+TEST_F(HostOrder, ALongWriteDelaysNothingButTheModule) {
+    start();
+    Client writer = connect();
+    writer.send(requestText("POST", "/api/VELT.Test.Order/v1/wait", admin, R"({"milliseconds":700})"));
+    std::this_thread::sleep_for(milliseconds(100));
+    const auto begin = std::chrono::steady_clock::now();
+    for (int i = 0; i < 20; ++i) {
+        EXPECT_EQ(get("/healthz").status, 200);
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(500));
+    EXPECT_EQ(writer.receive().status, 204);
+}
+
+TEST_F(HostOrder, ModulesThatBlockAllTheirThreadsDelayNothingElse) {
+    settings.workers = 2;
+    start();
+    std::vector<Client> readers;
+    for (int i = 0; i < 4; ++i) {
+        readers.push_back(connect());
+        readers.back().send(
+            requestText("POST", "/api/VELT.Test.Order/v1/get_wait", admin, R"({"milliseconds":600})"));
+    }
+    std::this_thread::sleep_for(milliseconds(100));
+    const auto begin = std::chrono::steady_clock::now();
+    for (const char* target : {"/healthz", "/api", "/api/log", "/api/tokens", "/openapi.json"}) {
+        EXPECT_EQ(get(target).status, 200) << target;
+    }
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(400));
+    for (Client& reader : readers) {
+        EXPECT_EQ(reader.receive().status, 204);
+    }
+}
+
+TEST_F(HostOrder, AStopFinishesWhatRuns) {
+    start();
+    Client client = connect();
+    client.send(requestText("POST", "/api/VELT.Test.Order/v1/wait", admin, R"({"milliseconds":500})"));
+    std::this_thread::sleep_for(milliseconds(100));
+    std::thread stopper([this] { stop(); });
+    const Answer answer = client.receive();
+    EXPECT_EQ(answer.status, 204);
+    EXPECT_EQ(answer.header("connection"), "close");
+    stopper.join();
+}
+
+TEST_F(HostOrder, TooManyWaitingRequestsAreTurnedAway) {
+    settings.workers = 1;
+    settings.maxWaiting = 2;
+    start();
+    std::vector<Client> clients;
+    for (int i = 0; i < 5; ++i) {
+        clients.push_back(connect());
+        clients.back().send(
+            requestText("POST", "/api/VELT.Test.Order/v1/wait", admin, R"({"milliseconds":300})"));
+        std::this_thread::sleep_for(milliseconds(30));
+    }
+    int refused = 0;
+    for (Client& client : clients) {
+        const Answer answer = client.receive();
+        refused += answer.status == 503;
+        EXPECT_TRUE(answer.status == 204 || (answer.status == 503 && answer.header("retry-after") == "5"));
+    }
+    EXPECT_EQ(refused, 2);
+}
+
+TEST(RequestOrder, AReadThatComesAfterAWaitingWriteWaitsForIt) {
+    RequestOrder order(4, 100);
+    std::promise<void> release;
+    std::mutex mutex;
+    std::string sequence;
+    const auto note = [&](char name) {
+        const std::lock_guard lock(mutex);
+        sequence += name;
+    };
+    std::promise<void> begun;
+    ASSERT_TRUE(order.submit(Kind::read, [&] {
+        begun.set_value();
+        release.get_future().wait();
+        note('1');
+    }));
+    begun.get_future().wait();
+    ASSERT_TRUE(order.submit(Kind::write, [&] { note('W'); }));
+    ASSERT_TRUE(order.submit(Kind::read, [&] { note('2'); }));
+    std::promise<void> beside;
+    ASSERT_TRUE(order.submit(Kind::unordered, [&] { beside.set_value(); }));
+    beside.get_future().wait();
+    release.set_value();
+    order.stop();
+    EXPECT_EQ(sequence, "1W2");
+}
+
+TEST(RequestOrder, AStopFinishesWhatWaitsAndTakesNoMore) {
+    RequestOrder order(2, 100);
+    std::atomic<int> done{0};
+    for (int i = 0; i < 20; ++i) {
+        EXPECT_TRUE(order.submit(i % 2 == 0 ? Kind::write : Kind::read, [&] {
+            std::this_thread::sleep_for(milliseconds(1));
+            ++done;
+        }));
+    }
+    order.stop();
+    EXPECT_EQ(done, 20);
+    EXPECT_FALSE(order.submit(Kind::read, [] {}));
+}
+
+} // namespace
