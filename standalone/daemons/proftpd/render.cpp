@@ -12,6 +12,8 @@ namespace velt {
 namespace {
 
 constexpr std::string_view codepage = "ISO-8859-1";
+// Built into the daemon of one release of Debian, modules to be loaded in the next.
+constexpr std::array<std::string_view, 3> neededModules{"mod_delay.c", "mod_ls.c", "mod_xfer.c"};
 
 std::string quoted(const std::filesystem::path& path) {
     return '"' + path.string() + '"';
@@ -60,10 +62,17 @@ void renderServer(Text& text, const ProftpdPlaces& places) {
 }
 
 void renderModules(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
+    const std::filesystem::path packageModules = "/usr/lib/proftpd";
+    text.line("ModulePath", packageModules);
+    for (const std::string_view module : neededModules) {
+        text.line("<IfModule", "!" + std::string(module) + ">");
+        text.line("  LoadModule", module);
+        text.line("</IfModule>");
+    }
     text.line("ModulePath", places.moduleFolder);
     text.line("LoadModule mod_velt_chroot.c");
     if ((settings.record.service_flags & VELT_FTP_SERVICE_TLS) != 0) {
-        text.line("ModulePath", std::filesystem::path("/usr/lib/proftpd"));
+        text.line("ModulePath", packageModules);
         text.line("LoadModule mod_tls.c");
     }
 }
