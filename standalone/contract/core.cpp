@@ -6,6 +6,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_files.h"
@@ -45,7 +46,7 @@ int writeSystemInformation(std::string_view key, std::string_view value) {
     if (!lock)
         return -1;
     return perform(Effect::store, "system information",
-                   [&] { return writeKeyValue(statePath(systemInformationFile), key, value); });
+                   [&] { return writeKeyValue(statePath(paths::systemInformation), key, value); });
 }
 
 } // namespace

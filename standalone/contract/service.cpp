@@ -6,6 +6,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings.h"
 
@@ -34,7 +35,7 @@ int setRunKey(const char* service, int value) {
             return fail(ErrorNumber::invalid,
                         "The run key " + std::to_string(value) + " is neither 1 nor 2.");
         }
-        return replaceFile(statePath("/etc/velt/run-keys") / service, std::to_string(value) + "\n", 0644);
+        return replaceFile(statePath(paths::runKeys) / service, std::to_string(value) + "\n", 0644);
     });
 }
 

@@ -2,6 +2,7 @@
 
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/candidate.h"
@@ -62,7 +63,7 @@ int changeExternalAddress(const std::string& address) {
     if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
         return -1;
     return perform(Effect::store, "external address", [&] {
-        return writeKeyValue(statePath(systemInformationFile), externalAddressKey, address);
+        return writeKeyValue(statePath(paths::systemInformation), externalAddressKey, address);
     });
 }
 

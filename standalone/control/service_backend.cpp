@@ -3,6 +3,7 @@
 #include "standalone/control/supervise_backend.h"
 #include "standalone/control/systemd_launcher.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <system_error>
@@ -23,7 +24,7 @@ std::unique_ptr<ServiceBackend> makeServiceBackend(const std::string& daemon) {
 }
 
 std::filesystem::path runDirectory() {
-    std::filesystem::path directory = statePath("/run/velt");
+    std::filesystem::path directory = statePath(paths::run);
     std::error_code error;
     std::filesystem::create_directories(directory, error);
     if (error) {

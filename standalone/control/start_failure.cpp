@@ -2,6 +2,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <filesystem>
@@ -11,7 +12,7 @@ namespace velt {
 namespace {
 
 std::filesystem::path noteFile(const std::string& daemon) {
-    return statePath("/run/velt") / (daemon + ".failure");
+    return statePath(paths::run) / (daemon + ".failure");
 }
 
 } // namespace

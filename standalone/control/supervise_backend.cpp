@@ -2,6 +2,7 @@
 
 #include "standalone/control/child_launcher.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/supervise/control_channel.h"
@@ -46,7 +47,7 @@ SuperviseBackend::SuperviseBackend(std::string daemon, std::unique_ptr<Superviso
     : daemon_(std::move(daemon)), launcher_(std::move(launcher)) {}
 
 ServiceState SuperviseBackend::state() const {
-    return readServiceState(stateFile(statePath("/run/velt"), daemon_)).value_or(ServiceState{});
+    return readServiceState(stateFile(statePath(paths::run), daemon_)).value_or(ServiceState{});
 }
 
 int SuperviseBackend::start(const DaemonPlan& plan) {
@@ -95,7 +96,7 @@ int SuperviseBackend::outcome(const std::string& reason) const {
 int SuperviseBackend::pause() {
     const ServiceState now = state();
     if (isAlive(now.supervisor)) {
-        const auto answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::pause, {}}, endLimit);
+        const auto answer = askSupervisor(statePath(paths::run), daemon_, {Command::pause, {}}, endLimit);
         if (answer && answer->empty()) {
             return 0;
         }
@@ -111,7 +112,7 @@ int SuperviseBackend::stop() {
     const ServiceState now = state();
     std::optional<std::string> answer;
     if (isAlive(now.supervisor)) {
-        answer = askSupervisor(statePath("/run/velt"), daemon_, {Command::stop, {}}, endLimit);
+        answer = askSupervisor(statePath(paths::run), daemon_, {Command::stop, {}}, endLimit);
     }
     const std::string reason = answer && !answer->empty() ? *answer : launcher_->retire();
     if (!reason.empty()) {
@@ -125,7 +126,7 @@ int SuperviseBackend::stop() {
                                                                 "do not end.");
     }
     std::error_code ignored;
-    std::filesystem::remove(stateFile(statePath("/run/velt"), daemon_), ignored);
+    std::filesystem::remove(stateFile(statePath(paths::run), daemon_), ignored);
     return 0;
 }
 

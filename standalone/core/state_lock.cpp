@@ -3,6 +3,7 @@
 #include "base/unique_fd.h"
 #include "standalone/core/file_lock.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <fcntl.h>
@@ -33,7 +34,7 @@ int failToLock(const std::filesystem::path& path, const std::string& why,
 }
 
 int openAndLock(UniqueFd& file) {
-    const auto path = statePath("/var/lib/velt/lock");
+    const auto path = statePath(paths::stateLock);
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
     if (error)

@@ -11,7 +11,7 @@ namespace velt {
 /// thread-safe. The environment variable VELT_STATE_ROOT sets it where nobody calls this.
 void setStateRoot(const std::filesystem::path& root);
 
-/// The place of a file below the root: statePath("/etc/velt/ftp.conf").
+/// The place of one of the files of paths.h below the root.
 std::filesystem::path statePath(std::string_view absolutePath);
 
 } // namespace velt

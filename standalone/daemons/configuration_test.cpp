@@ -1,6 +1,7 @@
 #include "standalone/daemons/configuration_test.h"
 
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/process/last_words.h"
@@ -20,7 +21,7 @@ namespace {
 constexpr std::string_view scratchPrefix = "test.";
 
 std::filesystem::path scratchParent() {
-    return statePath("/run/velt");
+    return statePath(paths::run);
 }
 
 UniqueFd lockedFolder(const std::filesystem::path& path) {

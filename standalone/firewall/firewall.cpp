@@ -2,6 +2,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/firewall_settings.h"
@@ -23,7 +24,7 @@ namespace {
 
 /// For the administrator: why ports may be closed although we opened them.
 std::filesystem::path warningFile() {
-    return statePath("/run/velt/firewall.warning");
+    return statePath(paths::firewallWarning);
 }
 
 std::string firstLine(const std::string& text) {
@@ -67,7 +68,7 @@ void warnOfForeignTables() {
 /// told about a firewall: its defaults would take away what the machine's own installation drops.
 bool mayTouchRules() {
     std::error_code ignored;
-    return statePath("/") == "/" || std::filesystem::exists(statePath("/etc/velt/firewall.conf"), ignored);
+    return statePath("/") == "/" || std::filesystem::exists(statePath(paths::firewallSettings), ignored);
 }
 
 int removeRules(const std::string& script) {

@@ -2,6 +2,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/ports/port_range.h"
 
@@ -104,7 +105,7 @@ std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, con
 }
 
 std::optional<FirewallSettings> loadFirewallSettings() {
-    const std::filesystem::path file = statePath("/etc/velt/firewall.conf");
+    const std::filesystem::path file = statePath(paths::firewallSettings);
     errno = 0;
     const auto text = readFile(file);
     if (text) {

@@ -2,6 +2,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
 #include "standalone/process/process_identity.h"
@@ -17,7 +18,7 @@ namespace velt {
 namespace {
 
 std::filesystem::path noteFile() {
-    return statePath("/run/velt/firewall.loaded");
+    return statePath(paths::loadedRules);
 }
 
 /// The network whose rules are meant: each has generations of its own.

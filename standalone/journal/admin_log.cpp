@@ -2,6 +2,7 @@
 
 #include "base/plain_text.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/journal/catalogue.h"
 #include "standalone/journal/log_database.h"
@@ -37,7 +38,7 @@ LogDatabase* currentDatabase(Connection& open) {
              "A process that was forked off while the administrator log was open cannot use it.");
         return nullptr;
     }
-    const std::filesystem::path path = statePath("/var/lib/velt/log.db");
+    const std::filesystem::path path = statePath(paths::logDatabase);
     if (open.database == nullptr || !open.database->leadsTo(path)) {
         open.database.reset();
         open.database = LogDatabase::open(path);

@@ -3,6 +3,7 @@
 #include "base/unique_fd.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <fcntl.h>
@@ -114,7 +115,7 @@ std::string renderEvent(const SystemEvent& event) {
 }
 
 int appendEvent(const SystemEvent& event) {
-    const std::filesystem::path path = statePath("/var/log/velt/events.jsonl");
+    const std::filesystem::path path = statePath(paths::events);
     const std::string line = renderEvent(event) + "\n";
     if (line.size() > longestLine) {
         return failToWrite(path, "it is longer than 64 KiB");

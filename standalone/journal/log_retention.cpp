@@ -3,6 +3,7 @@
 #include "base/plain_text.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <cerrno>
@@ -71,7 +72,7 @@ std::optional<LogRetention> parseRetention(std::string_view text, std::string& f
 }
 
 std::optional<LogRetention> loadRetention() {
-    const std::filesystem::path path = statePath("/etc/velt/log.conf");
+    const std::filesystem::path path = statePath(paths::logRetention);
     const std::optional<std::string> text = readFile(path);
     if (!text && errno == ENOENT) {
         return LogRetention{};

@@ -1,6 +1,7 @@
 #include "standalone/login/login_root.h"
 
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/trusted_file.h"
 #include "standalone/login/grants.h"
@@ -24,7 +25,7 @@ bool refuse(const std::string& why) {
 
 // A missing file is the same as no share, but for rules, which could have been taken away with their file.
 std::optional<std::vector<ShareEntry>> readShares() {
-    const auto path = statePath("/etc/velt/shares.json");
+    const auto path = statePath(paths::shares);
     std::error_code error;
     if (std::filesystem::symlink_status(path, error).type() == std::filesystem::file_type::not_found) {
         return std::vector<ShareEntry>();
@@ -43,7 +44,7 @@ std::optional<std::vector<ShareEntry>> readShares() {
 
 /// The path of the rule that applies, "" for none.
 std::optional<std::string> readRule(const Login& login) {
-    const auto text = readTrusted(statePath("/etc/velt/chroot_rules"));
+    const auto text = readTrusted(statePath(paths::chrootRules));
     const auto rules = text ? parseRules(*text) : std::nullopt;
     if (!rules) {
         return std::nullopt;

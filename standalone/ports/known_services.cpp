@@ -2,6 +2,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/ports/port_range.h"
 
@@ -37,7 +38,7 @@ std::optional<std::vector<KnownService>> parseKnownServices(std::string_view tex
 }
 
 std::optional<std::vector<KnownService>> loadKnownServices() {
-    const std::filesystem::path file = statePath("/etc/velt/known_services.conf");
+    const std::filesystem::path file = statePath(paths::knownServices);
     errno = 0;
     const auto text = readFile(file);
     if (text) {

@@ -3,6 +3,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 
@@ -17,7 +18,7 @@ namespace {
 constexpr std::string_view versionLine = "velt-chroot-rules 1";
 
 std::filesystem::path rulesFile() {
-    return statePath("/etc/velt/chroot_rules");
+    return statePath(paths::chrootRules);
 }
 
 bool isComponent(std::string_view component) {

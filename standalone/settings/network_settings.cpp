@@ -2,6 +2,7 @@
 
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_text.h"
 
@@ -16,7 +17,7 @@ constexpr int newestVersion = 1;
 } // namespace
 
 std::optional<NetworkSettings> loadNetworkSettings() {
-    const auto file = statePath("/etc/velt/network.conf");
+    const auto file = statePath(paths::networkSettings);
     const auto text = readFile(file);
     if (!text && errno == ENOENT) {
         return NetworkSettings{};

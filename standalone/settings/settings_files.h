@@ -10,9 +10,6 @@
 
 namespace velt {
 
-inline constexpr std::string_view ftpSettingsFile = "/etc/velt/ftp.conf";
-inline constexpr std::string_view sftpSettingsFile = "/etc/velt/sftp.conf";
-inline constexpr std::string_view systemInformationFile = "/etc/veltinfo.conf";
 inline constexpr std::string_view externalAddressKey = "ftp_ext_ip";
 
 /// The text of the FTP settings file: every byte of the record, and the settings beside it. The external

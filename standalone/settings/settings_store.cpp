@@ -4,6 +4,7 @@
 #include "standalone/core/file_store.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_files.h"
@@ -54,14 +55,14 @@ FtpSettings defaultFtpSettings() {
 }
 
 std::optional<FtpSettings> loadFtpFile() {
-    return loadFile<FtpSettings>(ftpSettingsFile, parseFtpSettings, defaultFtpSettings());
+    return loadFile<FtpSettings>(paths::ftpSettings, parseFtpSettings, defaultFtpSettings());
 }
 
 std::optional<FtpSettings> loadFtpSettings() {
     auto settings = loadFtpFile();
     if (!settings)
         return std::nullopt;
-    const auto file = statePath(systemInformationFile);
+    const auto file = statePath(paths::systemInformation);
     if (readKeyValue(file, externalAddressKey, settings->externalAddress) < 0)
         return std::nullopt;
     if (!settings->externalAddress.empty() && !isIPv4Address(settings->externalAddress)) {
@@ -72,24 +73,24 @@ std::optional<FtpSettings> loadFtpSettings() {
 }
 
 std::optional<SftpSettings> loadSftpSettings() {
-    return loadFile<SftpSettings>(sftpSettingsFile, parseSftpSettings, SftpSettings());
+    return loadFile<SftpSettings>(paths::sftpSettings, parseSftpSettings, SftpSettings());
 }
 
 int storeFtpSettings(const FtpSettings& settings) {
-    return storeFile("ftp settings", ftpSettingsFile, formatFtpSettings(settings));
+    return storeFile("ftp settings", paths::ftpSettings, formatFtpSettings(settings));
 }
 
 int storeSftpSettings(const SftpSettings& settings) {
-    return storeFile("sftp settings", sftpSettingsFile, formatSftpSettings(settings));
+    return storeFile("sftp settings", paths::sftpSettings, formatSftpSettings(settings));
 }
 
 int writeMissingSettings() {
     const StateLock lock;
     if (!lock)
         return -1;
-    if (isMissing(ftpSettingsFile) && storeFtpSettings(defaultFtpSettings()) < 0)
+    if (isMissing(paths::ftpSettings) && storeFtpSettings(defaultFtpSettings()) < 0)
         return -1;
-    return isMissing(sftpSettingsFile) ? storeSftpSettings(SftpSettings()) : 0;
+    return isMissing(paths::sftpSettings) ? storeSftpSettings(SftpSettings()) : 0;
 }
 
 } // namespace velt

@@ -4,6 +4,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_file.h"
@@ -15,8 +16,6 @@
 namespace velt {
 
 namespace {
-
-constexpr std::string_view shareFile = "/etc/velt/shares.json";
 
 // A listing of chroot rules looks a share up for each rule.
 struct Cache {
@@ -51,7 +50,7 @@ std::optional<std::vector<ShareEntry>> readShares(const std::filesystem::path& p
 } // namespace
 
 std::optional<std::vector<ShareEntry>> allShares() {
-    const std::filesystem::path path = statePath(shareFile);
+    const std::filesystem::path path = statePath(paths::shares);
     Cache& known = cache();
     const std::lock_guard lock(known.mutex);
     const FileStamp stamp = FileStamp::of(path);
@@ -76,7 +75,7 @@ int saveShares(const std::vector<ShareEntry>& shares) {
         return -1;
     }
     return perform(Effect::store, "shares",
-                   [&shares] { return replaceFile(statePath(shareFile), renderShares(shares), 0644); });
+                   [&shares] { return replaceFile(statePath(paths::shares), renderShares(shares), 0644); });
 }
 
 } // namespace velt

@@ -4,6 +4,7 @@
 #include "standalone/accounts/user_directory.h"
 #include "standalone/core/installed_files.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/settings/network_settings.h"
@@ -70,14 +71,14 @@ int surveyRights(ProftpdPlaces& places) {
     }
     places.user = self->name;
     places.group = group->name;
-    places.accountFiles = AccountFiles{statePath("/etc/velt/ftp.passwd"), statePath("/etc/velt/ftp.group")};
+    places.accountFiles = AccountFiles{statePath(paths::ftpPasswd), statePath(paths::ftpGroup)};
     return 0;
 }
 
 } // namespace
 
 std::filesystem::path ftpRunFolder() {
-    return statePath("/run/velt/ftp");
+    return statePath(paths::ftpRun);
 }
 
 std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {

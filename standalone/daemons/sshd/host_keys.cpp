@@ -3,6 +3,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/configuration_test.h"
@@ -84,7 +85,7 @@ std::optional<std::vector<std::filesystem::path>> hostKeys() {
     if (!lock) {
         return std::nullopt;
     }
-    auto keys = keysIn(statePath("/var/lib/velt/ssh"));
+    auto keys = keysIn(statePath(paths::hostKeys));
     if (std::ranges::all_of(keys, isThere)) {
         return keys;
     }

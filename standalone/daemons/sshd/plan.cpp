@@ -1,6 +1,7 @@
 #include "base/sha256.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/candidate.h"
@@ -78,7 +79,7 @@ std::optional<DaemonPlan> planSftpDaemon() {
     }
     DaemonPlan plan;
     plan.configurationHash = sha256(*text);
-    plan.folder = statePath("/run/velt/sftp/configurations") / plan.configurationHash;
+    plan.folder = statePath(paths::sftpConfigurations) / plan.configurationHash;
     const auto configuration = plan.folder / "sshd_config";
     if (replaceFile(configuration, *text, 0600) < 0) {
         return std::nullopt;

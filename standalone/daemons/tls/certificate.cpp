@@ -4,6 +4,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
+#include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/configuration_test.h"
@@ -121,11 +122,11 @@ bool isThere(const std::filesystem::path& path) {
 } // namespace
 
 std::optional<ServerCertificate> serverCertificate() {
-    const Pair given{statePath("/etc/velt/tls/server.crt"), statePath("/etc/velt/tls/server.key")};
+    const Pair given{statePath(paths::givenCertificate), statePath(paths::givenKey)};
     if (isThere(given.certificate) || isThere(given.key)) {
         return load(given);
     }
-    const Pair own{statePath("/var/lib/velt/tls/server.crt"), statePath("/var/lib/velt/tls/server.key")};
+    const Pair own{statePath(paths::ownCertificate), statePath(paths::ownKey)};
     const StateLock lock;
     if (!lock) {
         return std::nullopt;

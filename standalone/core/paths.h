@@ -1,0 +1,42 @@
+// The files and folders of this system, each written down once: arguments of statePath.
+#ifndef VELT_STANDALONE_CORE_PATHS_H
+#define VELT_STANDALONE_CORE_PATHS_H
+
+#include <string_view>
+
+namespace velt::paths {
+
+// What administrators may edit.
+inline constexpr std::string_view ftpSettings = "/etc/velt/ftp.conf";
+inline constexpr std::string_view sftpSettings = "/etc/velt/sftp.conf";
+inline constexpr std::string_view networkSettings = "/etc/velt/network.conf";
+inline constexpr std::string_view firewallSettings = "/etc/velt/firewall.conf";
+inline constexpr std::string_view logRetention = "/etc/velt/log.conf";
+inline constexpr std::string_view knownServices = "/etc/velt/known_services.conf";
+inline constexpr std::string_view shares = "/etc/velt/shares.json";
+inline constexpr std::string_view chrootRules = "/etc/velt/chroot_rules";
+inline constexpr std::string_view ftpPasswd = "/etc/velt/ftp.passwd"; ///< for a daemon without root
+inline constexpr std::string_view ftpGroup = "/etc/velt/ftp.group";
+inline constexpr std::string_view givenCertificate = "/etc/velt/tls/server.crt";
+inline constexpr std::string_view givenKey = "/etc/velt/tls/server.key";
+inline constexpr std::string_view runKeys = "/etc/velt/run-keys"; ///< a folder, one file for each service
+inline constexpr std::string_view systemInformation = "/etc/veltinfo.conf"; ///< shared with other programs
+
+// What this system keeps for itself.
+inline constexpr std::string_view stateLock = "/var/lib/velt/lock";
+inline constexpr std::string_view logDatabase = "/var/lib/velt/log.db";
+inline constexpr std::string_view hostKeys = "/var/lib/velt/ssh"; ///< a folder
+inline constexpr std::string_view ownCertificate = "/var/lib/velt/tls/server.crt";
+inline constexpr std::string_view ownKey = "/var/lib/velt/tls/server.key";
+inline constexpr std::string_view events = "/var/log/velt/events.jsonl"; ///< and older ones, ".1" to ".4"
+
+// What does not outlive a boot.
+inline constexpr std::string_view run = "/run/velt"; ///< a folder; supervisors keep their files in it
+inline constexpr std::string_view ftpRun = "/run/velt/ftp";
+inline constexpr std::string_view sftpConfigurations = "/run/velt/sftp/configurations"; ///< a folder
+inline constexpr std::string_view loadedRules = "/run/velt/firewall.loaded";
+inline constexpr std::string_view firewallWarning = "/run/velt/firewall.warning";
+
+} // namespace velt::paths
+
+#endif
