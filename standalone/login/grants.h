@@ -3,7 +3,7 @@
 #define VELT_STANDALONE_LOGIN_GRANTS_H
 
 #include "standalone/login/login.h"
-#include "standalone/login/view.h"
+#include "standalone/login/view_mounts.h"
 #include "standalone/shares/share_store.h"
 
 #include <vector>

@@ -1,4 +1,4 @@
-// velt-share-root STATE KIND ROOT USER UID GIDS HOME [FILE]
+// velt-login-view STATE KIND ROOT USER UID GIDS HOME [FILE]
 //
 // Makes the folder ROOT show what a login of the FTP daemon may see, in the mount namespace of the session
 // that started this program, and ends: with 0 when the session may go on with ROOT as its root directory,
@@ -11,7 +11,7 @@
 #include "base/plain_text.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/login/login_root.h"
+#include "standalone/login/login_view.h"
 
 #include <grp.h>
 #include <sys/stat.h>
@@ -91,7 +91,7 @@ int refuse(std::string_view why) {
 int run(int count, char** arguments) {
     velt::Login login;
     if (!readLogin(count, arguments, login)) {
-        return refuse("usage: velt-share-root STATE KIND ROOT USER UID GIDS HOME [FILE]");
+        return refuse("usage: velt-login-view STATE KIND ROOT USER UID GIDS HOME [FILE]");
     }
     umask(022);
     if (!becomeRoot()) {
@@ -99,7 +99,7 @@ int run(int count, char** arguments) {
     }
     velt::setStateRoot(arguments[1]);
     std::vector<std::string> remarks;
-    if (!velt::makeLoginRoot(login, arguments[3], remarks)) {
+    if (!velt::makeLoginView(login, arguments[3], remarks)) {
         return refuse(velt::lastErrorSentence());
     }
     for (const std::string& remark : remarks) {

@@ -182,8 +182,8 @@ TEST_F(QuickStart, worksWithoutRootsRights) {
     // Where carol can get to it, wherever the tests were built.
     const std::string built = "/mnt/built";
     fs::create_directory(built);
-    for (const char* program : {"veltd", "veltctl", "velt-supervise", "velt-share-root",
-                                "libvelt-standalone.so", "mod_velt_chroot.so", "VELT.Core.FileServ.FTP.so"}) {
+    for (const char* program : {"veltd", "veltctl", "velt-supervise", "velt-login-view",
+                                "libvelt-standalone.so", "mod_velt_login.so", "VELT.Core.FileServ.FTP.so"}) {
         fs::copy_file(fs::path(VELT_BUILT_FOLDER) / program, fs::path(built) / program);
     }
     const std::string startHere = "scripts/start --built " + built;

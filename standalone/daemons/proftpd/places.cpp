@@ -84,9 +84,9 @@ std::filesystem::path ftpRunFolder() {
 std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
     FtpSurroundings found;
     auto& places = found.places;
-    places.moduleFolder = installedFile("mod_velt_chroot.so").parent_path();
+    places.moduleFolder = installedFile("mod_velt_login.so").parent_path();
     places.runFolder = ftpRunFolder();
-    places.loginProgram = installedFile("velt-share-root");
+    places.loginProgram = installedFile("velt-login-view");
     places.stateRoot = statePath("/");
     places.loginRoot = ftpRunFolder() / "root";
     // As long as the place in the plan's own folder, whose name is known only when all of this is.

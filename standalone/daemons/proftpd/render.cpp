@@ -70,7 +70,7 @@ void renderModules(Text& text, const FtpSettings& settings, const ProftpdPlaces&
         text.line("</IfModule>");
     }
     text.line("ModulePath", places.moduleFolder);
-    text.line("LoadModule mod_velt_chroot.c");
+    text.line("LoadModule mod_velt_login.c");
     if ((settings.record.service_flags & VELT_FTP_SERVICE_TLS) != 0) {
         text.line("ModulePath", packageModules);
         text.line("LoadModule mod_tls.c");
@@ -174,14 +174,14 @@ void renderFiles(Text& text, const FtpSettings& settings) {
     text.line("Umask", settings.umask ? "022 022" : "000 000");
 }
 
-void renderLoginRoot(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
+void renderLoginView(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
     const auto& record = settings.record;
     const char* others = places.accountFiles ? "server" : "shares";
     const char* kind = record.user_chroot != 0 ? "home" : others;
     if (record.anonymous != 0 && record.anonymous_chroot != 0) {
-        text.line("VeltLoginRoot", places.loginProgram, places.stateRoot, kind, places.anonymousShare);
+        text.line("VeltLoginView", places.loginProgram, places.stateRoot, kind, places.anonymousShare);
     } else {
-        text.line("VeltLoginRoot", places.loginProgram, places.stateRoot, kind);
+        text.line("VeltLoginView", places.loginProgram, places.stateRoot, kind);
     }
     // A daemon without root's rights cannot change the root directory: where it must, it refuses the login.
     if (!places.accountFiles || record.user_chroot != 0) {
@@ -204,7 +204,7 @@ void renderLogin(Text& text, const FtpSettings& settings, const ProftpdPlaces& p
     }
     text.line("RequireValidShell off");
     text.line("PersistentPasswd off");
-    renderLoginRoot(text, settings, places);
+    renderLoginView(text, settings, places);
 }
 
 void renderAnonymous(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {

@@ -19,9 +19,9 @@ struct AccountFiles {
 /// What the configuration needs to know beside the settings. All of it is made by the platform; none of it is
 /// text that reached the platform through a request.
 struct ProftpdPlaces {
-    std::filesystem::path moduleFolder; ///< holds mod_velt_chroot.so
+    std::filesystem::path moduleFolder; ///< holds mod_velt_login.so
     std::filesystem::path runFolder;    ///< for the daemon's own run-time files
-    std::filesystem::path loginProgram; ///< velt-share-root
+    std::filesystem::path loginProgram; ///< velt-login-view
     std::filesystem::path stateRoot;
     std::filesystem::path loginRoot; ///< an empty folder, on which the program shows what a login may see
     std::filesystem::path anonymousShare; ///< a file: names the share that anonymous users are confined to

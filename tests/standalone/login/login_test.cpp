@@ -7,8 +7,8 @@
 #include <sys/stat.h>
 
 extern "C" {
-#include "standalone/login/helper.h"
-#include "tests/standalone/login/login_root.h"
+#include "standalone/login/login_program.h"
+#include "tests/standalone/login/stand_in_daemon.h"
 }
 
 #include <array>
@@ -79,7 +79,7 @@ TEST_F(LoginModule, waitsForAProgramNoLongerThanItSays) {
     std::array<char*, 2> arguments{const_cast<char*>(program.c_str()), nullptr};
     std::array<char, 64> words{};
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_EQ(velt_helper_run(arguments.data(), 1, words.data(), words.size()), 0);
+    EXPECT_EQ(velt_run_login_program(arguments.data(), 1, words.data(), words.size()), 0);
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
     EXPECT_STREQ(words.data(), "it takes too long");
 }
@@ -90,7 +90,7 @@ TEST_F(LoginModule, cutsLongWords) {
     std::array<char*, 2> arguments{const_cast<char*>(program.c_str()), nullptr};
     std::array<char, 20> words{};
     words.fill('x');
-    EXPECT_EQ(velt_helper_run(arguments.data(), 10, words.data(), words.size()), 0);
+    EXPECT_EQ(velt_run_login_program(arguments.data(), 10, words.data(), words.size()), 0);
     EXPECT_STREQ(words.data(), "0123456789012345 01");
 }
 

@@ -22,7 +22,7 @@ inline ProftpdPlaces places() {
     ProftpdPlaces places;
     places.moduleFolder = "/usr/libexec/velt";
     places.runFolder = "/run/velt/ftp";
-    places.loginProgram = "/usr/libexec/velt/velt-share-root";
+    places.loginProgram = "/usr/libexec/velt/velt-login-view";
     places.stateRoot = "/";
     places.loginRoot = "/run/velt/ftp/root";
     places.anonymousShare = "/run/velt/ftp/configurations/0/anonymous";

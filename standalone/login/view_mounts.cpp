@@ -1,4 +1,4 @@
-#include "standalone/login/view.h"
+#include "standalone/login/view_mounts.h"
 
 #include "standalone/core/last_error.h"
 #include "standalone/login/open_folder.h"

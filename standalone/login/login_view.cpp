@@ -1,4 +1,4 @@
-#include "standalone/login/login_root.h"
+#include "standalone/login/login_view.h"
 
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
@@ -6,7 +6,7 @@
 #include "standalone/core/trusted_file.h"
 #include "standalone/login/grants.h"
 #include "standalone/login/open_folder.h"
-#include "standalone/login/view.h"
+#include "standalone/login/view_mounts.h"
 #include "standalone/rules/rule_store.h"
 #include "standalone/shares/share_file.h"
 
@@ -150,7 +150,7 @@ bool showToAnonymous(const Login& login, const std::filesystem::path& root,
 
 } // namespace
 
-bool makeLoginRoot(const Login& login, const std::filesystem::path& root, std::vector<std::string>& remarks) {
+bool makeLoginView(const Login& login, const std::filesystem::path& root, std::vector<std::string>& remarks) {
     const bool anonymous = login.kind == LoginKind::anonymous;
     const auto rule = anonymous ? std::string() : readRule(login);
     if (!rule) {

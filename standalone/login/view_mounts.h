@@ -1,6 +1,6 @@
 // The file tree that a login sees, made of mounts in this process's own mount namespace.
-#ifndef VELT_STANDALONE_LOGIN_VIEW_H
-#define VELT_STANDALONE_LOGIN_VIEW_H
+#ifndef VELT_STANDALONE_LOGIN_VIEW_MOUNTS_H
+#define VELT_STANDALONE_LOGIN_VIEW_MOUNTS_H
 
 #include "base/unique_fd.h"
 

@@ -1,9 +1,9 @@
 /* Lets the FTP daemon's module decide on a login, with a stand-in for the daemon around it. */
-#ifndef VELT_TESTS_STANDALONE_LOGIN_LOGIN_ROOT_H
-#define VELT_TESTS_STANDALONE_LOGIN_LOGIN_ROOT_H
+#ifndef VELT_TESTS_STANDALONE_LOGIN_STAND_IN_DAEMON_H
+#define VELT_TESTS_STANDALONE_LOGIN_STAND_IN_DAEMON_H
 
 struct login_world {
-    const char* program;    /* "": no VeltLoginRoot in the configuration */
+    const char* program;    /* "": no VeltLoginView in the configuration */
     const char* state_root; /* handed to the program */
     int knows_user;
     int knows_groups;

@@ -1,4 +1,4 @@
-#include "standalone/login/helper.h"
+#include "standalone/login/login_program.h"
 
 #include <errno.h>
 #include <fcntl.h>
@@ -139,7 +139,7 @@ static int await(pid_t child, int errors, int limit, char* words, size_t size) {
     return 1;
 }
 
-int velt_helper_run(char* const arguments[], int limit, char* words, size_t size) {
+int velt_run_login_program(char* const arguments[], int limit, char* words, size_t size) {
     int ends[2] = {-1, -1};
     pid_t child = -1;
 

@@ -1,6 +1,6 @@
 // The root directory of one login.
-#ifndef VELT_STANDALONE_LOGIN_LOGIN_ROOT_H
-#define VELT_STANDALONE_LOGIN_LOGIN_ROOT_H
+#ifndef VELT_STANDALONE_LOGIN_LOGIN_VIEW_H
+#define VELT_STANDALONE_LOGIN_LOGIN_VIEW_H
 
 #include "standalone/login/login.h"
 
@@ -15,7 +15,7 @@ namespace velt {
 /// the shares. All this happens in the mount namespace of this process, which must be no one else's but the
 /// session's. False, with the last error set, when the login is to be refused. Otherwise `remarks` gets a
 /// sentence for each share that had to be left out.
-bool makeLoginRoot(const Login& login, const std::filesystem::path& root, std::vector<std::string>& remarks);
+bool makeLoginView(const Login& login, const std::filesystem::path& root, std::vector<std::string>& remarks);
 
 } // namespace velt
 

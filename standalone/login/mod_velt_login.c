@@ -1,7 +1,7 @@
 /* Gives each login the root directory that is made for it.
  *
  * As soon as a password is right, the session gets a mount namespace of its own, in which a program of ours
- * (VeltLoginRoot) makes one folder show what the login may see. That folder is the DefaultRoot, and the
+ * (VeltLoginView) makes one folder show what the login may see. That folder is the DefaultRoot, and the
  * directory of <Anonymous>, in the configuration. It is empty for everybody else, so that a session which
  * were led there without us would see nothing. Where the program refuses a login, the password counts as
  * wrong.
@@ -9,13 +9,13 @@
 #include "conf.h"
 #include "privs.h"
 
-#include "standalone/login/helper.h"
+#include "standalone/login/login_program.h"
 
 #include <sched.h>
 
-#define MODULE_VERSION "mod_velt_chroot/2.0"
+#define MODULE_VERSION "mod_velt_login/2.0"
 
-module velt_chroot_module;
+module velt_login_module;
 
 /* Far more than a login takes, and less than clients wait. */
 static const int longest_run = 20;
@@ -79,7 +79,7 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
         } else if (isolated && unshare(CLONE_NEWNS) < 0) {
             (void)snprintf(words, sizeof(words), "no mount namespace: %s", strerror(errno));
         } else {
-            good = velt_helper_run(arguments, longest_run, words, sizeof(words));
+            good = velt_run_login_program(arguments, longest_run, words, sizeof(words));
         }
         PRIVS_RELINQUISH
     }
@@ -93,12 +93,12 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
 
 /* Makes `root` show what the user who logs in may see. */
 static int make_view(const char* root, int anonymous) {
-    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "VeltLoginRoot", FALSE);
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "VeltLoginView", FALSE);
     const char* user = session.user;
 
     made_for = NULL;
     if (c == NULL || user == NULL) {
-        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login refused: no VeltLoginRoot");
+        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login refused: no VeltLoginView");
         return FALSE;
     }
     pool* p = make_sub_pool(session.pool);
@@ -141,8 +141,8 @@ static void on_chroot(const void* root, void* ignored) {
     }
 }
 
-/* usage: VeltLoginRoot program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
-MODRET set_velt_login_root(cmd_rec* cmd) {
+/* usage: VeltLoginView program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
+MODRET set_velt_login_view(cmd_rec* cmd) {
     if (cmd->argc < 4 || cmd->argc > 5) {
         CONF_ERROR(cmd, "wrong number of parameters");
     }
@@ -159,18 +159,18 @@ MODRET set_velt_login_root(cmd_rec* cmd) {
 }
 
 static int velt_sess_init(void) {
-    if (pr_event_register(&velt_chroot_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
-        pr_event_register(&velt_chroot_module, "core.chroot", on_chroot, NULL) < 0) {
+    if (pr_event_register(&velt_login_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
+        pr_event_register(&velt_login_module, "core.chroot", on_chroot, NULL) < 0) {
         return -1;
     }
     return 0;
 }
 
 static conftable velt_conftab[] = {
-    {"VeltLoginRoot", set_velt_login_root, NULL},
+    {"VeltLoginView", set_velt_login_view, NULL},
     {NULL, NULL, NULL},
 };
 
-module velt_chroot_module = {
-    NULL, NULL, 0x20, "velt_chroot", velt_conftab, NULL, NULL, NULL, velt_sess_init, MODULE_VERSION, NULL, 0,
+module velt_login_module = {
+    NULL, NULL, 0x20, "velt_login", velt_conftab, NULL, NULL, NULL, velt_sess_init, MODULE_VERSION, NULL, 0,
 };

@@ -1,9 +1,9 @@
-#include "tests/standalone/login/login_root.h"
+#include "tests/standalone/login/stand_in_daemon.h"
 
 #include "conf.h"
 #include "privs.h"
 
-extern module velt_chroot_module;
+extern module velt_login_module;
 
 session_t session;
 server_rec* main_server = NULL;
@@ -101,7 +101,7 @@ config_rec* find_config(xaset_t* set, int type, const char* name, int recurse) {
     arguments[2] = "server";
     found.argc = 3;
     found.argv = arguments;
-    return strcmp(name, "VeltLoginRoot") == 0 && world->program[0] != '\0' ? &found : NULL;
+    return strcmp(name, "VeltLoginView") == 0 && world->program[0] != '\0' ? &found : NULL;
 }
 
 config_rec* add_config_param_str(const char* name, unsigned int count, ...) {
@@ -179,7 +179,7 @@ static void begin(const struct login_world* login) {
     ended = FALSE;
     log_text[0] = '\0';
     session.user = "alice";
-    (void)velt_chroot_module.sess_init();
+    (void)velt_login_module.sess_init();
 }
 
 enum login_end log_in(const struct login_world* login) {
