@@ -14,6 +14,7 @@
 
 #include <unistd.h>
 
+#include <cerrno>
 #include <climits>
 #include <cstdio>
 #include <thread>
@@ -64,7 +65,8 @@ protected:
     }
 
     static std::string thisProcess() {
-        return "standalone_port (process " + std::to_string(::getpid()) + ")";
+        return std::string(program_invocation_short_name).substr(0, 15) + " (process " +
+               std::to_string(::getpid()) + ")";
     }
 
     int ftpPort_ = freePort();

@@ -85,7 +85,8 @@ TEST(ListeningSockets, AreFoundOfAProcessThatHidesThem) {
 TEST(ListeningSockets, HaveAnOwner) {
     const int port = freePort();
     const Listener listener(port);
-    EXPECT_EQ(describeListener(port), "standalone_port (process " + std::to_string(::getpid()) + ")");
+    EXPECT_EQ(describeListener(port), std::string(program_invocation_short_name).substr(0, 15) +
+                                          " (process " + std::to_string(::getpid()) + ")");
     EXPECT_EQ(describeListener(freePort()), "another program");
 }
 
@@ -100,9 +101,9 @@ TEST(PortProbe, NamesTheHolderUnlessItIsTheOneThatAsks) {
     const int port = freePort();
     const Listener listener(port);
     EXPECT_LT(probePorts({freePort(), port}), 0);
-    EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) +
-                                       " is in use by standalone_port (process " +
-                                       std::to_string(::getpid()) + ").");
+    EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) + " is in use by " +
+                                       std::string(program_invocation_short_name).substr(0, 15) +
+                                       " (process " + std::to_string(::getpid()) + ").");
     EXPECT_EQ(probePorts({port}, ::getpid()), 0);
 }
 
