@@ -1,6 +1,6 @@
 #include "standalone/core/last_error.h"
+#include "standalone/core/quoted_text.h"
 #include "standalone/settings/settings.h"
-#include "standalone/settings/settings_text.h"
 
 #include <arpa/inet.h>
 

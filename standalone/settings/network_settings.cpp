@@ -1,36 +1,25 @@
 #include "standalone/settings/network_settings.h"
 
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
-#include "standalone/settings/settings_text.h"
-
-#include <cerrno>
-#include <cstring>
+#include "standalone/core/strict_file.h"
 
 namespace velt {
-namespace {
-
-constexpr int newestVersion = 1;
-
-} // namespace
 
 std::optional<NetworkSettings> loadNetworkSettings() {
-    const auto file = statePath(paths::networkSettings);
-    const auto text = readFile(file);
-    if (!text && errno == ENOENT) {
-        return NetworkSettings{};
-    }
-    if (!text) {
-        fail(ErrorNumber::store,
-             "Cannot read the settings file " + file.string() + ": " + std::strerror(errno) + ".");
+    Result<StrictFile> file = StrictFile::load(statePath(paths::networkSettings));
+    if (!file) {
+        fail(file.error());
         return std::nullopt;
     }
-    SettingsReader reader(file.string(), *text, newestVersion);
     NetworkSettings settings;
-    settings.loopbackOnly = reader.boolean("loopback_only");
-    return reader.finish() ? std::optional(settings) : std::nullopt;
+    settings.loopbackOnly = file->boolean("loopback_only", settings.loopbackOnly);
+    if (Result<> done = file->finish(); !done) {
+        fail(done.error());
+        return std::nullopt;
+    }
+    return settings;
 }
 
 } // namespace velt

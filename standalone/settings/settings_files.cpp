@@ -1,15 +1,17 @@
 #include "standalone/settings/settings_files.h"
 
-#include "standalone/settings/settings_text.h"
+#include "standalone/core/quoted_text.h"
+#include "standalone/core/strict_file.h"
 
+#include <algorithm>
 #include <array>
+#include <cstdint>
+#include <limits>
 #include <span>
 
 namespace velt {
 
 namespace {
-
-constexpr std::int32_t newestVersion = 1;
 
 constexpr std::string_view header =
     " settings of this server. The file is written anew whenever the administration changes a\n"
@@ -77,6 +79,16 @@ std::string fieldText(std::span<const char> field) {
     return quotedText(bytes.substr(0, last == std::string_view::npos ? 0 : last + 1));
 }
 
+std::int32_t readNumber(StrictFile& file, const char* key) {
+    using Limits = std::numeric_limits<std::int32_t>;
+    return static_cast<std::int32_t>(file.number(key, Limits::min(), Limits::max(), 0));
+}
+
+void readField(StrictFile& file, const char* key, std::span<char> field) {
+    const std::string text = file.text(key, field.size(), "");
+    std::fill(std::copy(text.begin(), text.end(), field.begin()), field.end(), '\0');
+}
+
 std::string settingsHeader(std::string_view service) {
     return std::string("# ").append(service).append(header).append("version = 1\n");
 }
@@ -101,20 +113,22 @@ std::string formatFtpSettings(const FtpSettings& settings) {
     return text;
 }
 
-std::optional<FtpSettings> parseFtpSettings(const std::string& file, std::string_view contents) {
-    SettingsReader reader(file, contents, newestVersion);
+Result<FtpSettings> parseFtpSettings(const std::string& name, std::string_view contents) {
+    Result<StrictFile> file = StrictFile::parse(name, contents);
+    if (!file)
+        return file.error();
     FtpSettings settings;
-    reader.bytes("port", settings.record.portnum);
-    reader.bytes("anonymous_chroot_share", settings.record.anonymous_chroot_share);
+    readField(*file, "port", settings.record.portnum);
+    readField(*file, "anonymous_chroot_share", settings.record.anonymous_chroot_share);
     for (const RecordNumber& number : recordNumbers)
-        settings.record.*number.field = reader.integer(number.key);
+        settings.record.*number.field = readNumber(*file, number.key);
     for (const RecordNumber& number : securityNumbers)
-        settings.record.*number.field = reader.integer(number.key);
+        settings.record.*number.field = readNumber(*file, number.key);
     for (const Switch& item : switches)
-        settings.*item.field = reader.boolean(item.key);
-    settings.timeout = reader.integer("timeout");
-    if (!reader.finish())
-        return std::nullopt;
+        settings.*item.field = file->boolean(item.key, settings.*item.field);
+    settings.timeout = readNumber(*file, "timeout");
+    if (Result<> done = file->finish(); !done)
+        return done.error();
     return settings;
 }
 
@@ -125,13 +139,15 @@ std::string formatSftpSettings(const SftpSettings& settings) {
     return text;
 }
 
-std::optional<SftpSettings> parseSftpSettings(const std::string& file, std::string_view contents) {
-    SettingsReader reader(file, contents, newestVersion);
+Result<SftpSettings> parseSftpSettings(const std::string& name, std::string_view contents) {
+    Result<StrictFile> file = StrictFile::parse(name, contents);
+    if (!file)
+        return file.error();
     SftpSettings settings;
-    settings.enabled = reader.boolean("enabled");
-    settings.port = reader.integer("port");
-    if (!reader.finish())
-        return std::nullopt;
+    settings.enabled = file->boolean("enabled", settings.enabled);
+    settings.port = readNumber(*file, "port");
+    if (Result<> done = file->finish(); !done)
+        return done.error();
     return settings;
 }
 

@@ -2,9 +2,9 @@
 #ifndef VELT_STANDALONE_SETTINGS_SETTINGS_FILES_H
 #define VELT_STANDALONE_SETTINGS_SETTINGS_FILES_H
 
+#include "base/result.h"
 #include "standalone/settings/settings.h"
 
-#include <optional>
 #include <string>
 #include <string_view>
 
@@ -16,12 +16,12 @@ inline constexpr std::string_view externalAddressKey = "ftp_ext_ip";
 /// address stands in the system information file, not here.
 std::string formatFtpSettings(const FtpSettings& settings);
 
-/// Reads what formatFtpSettings wrote; nothing, with the last error naming `file` and the line, when the text
-/// does not have that form. The external address stays empty.
-std::optional<FtpSettings> parseFtpSettings(const std::string& file, std::string_view contents);
+/// Reads what formatFtpSettings wrote; errors name the file by `name`, and the line. The external address
+/// stays empty.
+Result<FtpSettings> parseFtpSettings(const std::string& name, std::string_view contents);
 
 std::string formatSftpSettings(const SftpSettings& settings);
-std::optional<SftpSettings> parseSftpSettings(const std::string& file, std::string_view contents);
+Result<SftpSettings> parseSftpSettings(const std::string& name, std::string_view contents);
 
 } // namespace velt
 

@@ -21,18 +21,22 @@ namespace {
 constexpr mode_t settingsMode = 0644;
 
 template<class Settings>
-using Parse = std::optional<Settings> (*)(const std::string& file, std::string_view contents);
+using Parse = Result<Settings> (*)(const std::string& name, std::string_view contents);
 
 template<class Settings>
 std::optional<Settings> loadFile(std::string_view name, Parse<Settings> parse, const Settings& defaults) {
     const auto path = statePath(name);
     const auto contents = readFile(path);
-    if (contents)
-        return parse(path.string(), *contents);
+    if (contents) {
+        if (Result<Settings> settings = parse(path.string(), *contents))
+            return *settings;
+        else
+            fail(settings.error());
+        return std::nullopt;
+    }
     if (errno == ENOENT)
         return defaults;
-    fail(ErrorNumber::store,
-         "Cannot read the settings file " + path.string() + ": " + std::strerror(errno) + ".");
+    fail(ErrorNumber::store, "Cannot read " + path.string() + ": " + std::strerror(errno) + ".");
     return std::nullopt;
 }
 

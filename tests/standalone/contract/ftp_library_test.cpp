@@ -220,8 +220,8 @@ TEST_F(FtpContract, ADamagedFileFailsEveryOperationAndIsNotOverwritten) {
     _tag_VELT_FTP_CONF_ conf{};
     EXPECT_LT(VELTFTPConfGet(&conf), 0);
     EXPECT_EQ(VLIBCErrGet(), 0x0301);
-    EXPECT_EQ(lastErrorSentence(), "Settings file " + place("/etc/velt/ftp.conf") +
-                                       ", line 2: the value of port is no text in double quotes.");
+    EXPECT_EQ(lastErrorSentence(), "Cannot read " + place("/etc/velt/ftp.conf") +
+                                       ", line 2: port: expected a text in double quotes.");
     EXPECT_LT(VELTFTPTimeOutGet(), 0);
     EXPECT_LT(VELTFTPUseUTF8Get(), 0);
     EXPECT_LT(VELTFTPFIPSEnabledGet(), 0);

@@ -60,8 +60,8 @@ TEST_F(SftpContract, ADamagedFileIsNamedAndKept) {
     root_.write("etc/velt/sftp.conf", "version = 1\nenabled = 1\nport = 22a\n");
     _tag_VELT_SFTP_CONFIG_ conf{};
     EXPECT_LT(VELTSFTPConfigGet(1, &conf), 0);
-    EXPECT_EQ(lastErrorSentence(), "Settings file " + place("/etc/velt/sftp.conf") +
-                                       ", line 3: the value of port is no whole number of 32 bits.");
+    EXPECT_EQ(lastErrorSentence(), "Cannot read " + place("/etc/velt/sftp.conf") +
+                                       ", line 3: port: expected a number from -2147483648 to 2147483647.");
     EXPECT_LT(VELTSFTPConfigSet(1, 22), 0);
     EXPECT_EQ(root_.read("etc/velt/sftp.conf"), "version = 1\nenabled = 1\nport = 22a\n");
 }

@@ -22,16 +22,16 @@ TEST_F(NetworkSettingsFile, KeepsTheServicesOnTheLoopback) {
 }
 
 TEST_F(NetworkSettingsFile, IsNeverGuessed) {
-    const std::string file = "Settings file " + place("/etc/velt/network.conf");
+    const std::string file = "Cannot read " + place("/etc/velt/network.conf");
     root_.write("etc/velt/network.conf", "version = 1\nloopback_only = yes\n");
     EXPECT_FALSE(loadNetworkSettings());
-    EXPECT_EQ(lastErrorSentence(), file + ", line 2: the value of loopback_only is neither 0 nor 1.");
+    EXPECT_EQ(lastErrorSentence(), file + ", line 2: loopback_only: expected 0 or 1.");
     root_.write("etc/velt/network.conf", "version = 1\n");
     EXPECT_FALSE(loadNetworkSettings());
-    EXPECT_EQ(lastErrorSentence(), file + ": the key loopback_only is missing.");
+    EXPECT_EQ(lastErrorSentence(), file + ": missing key \"loopback_only\".");
     root_.write("etc/velt/network.conf", "version = 1\nloopback_only = 0\nlisten = 192.0.2.1\n");
     EXPECT_FALSE(loadNetworkSettings());
-    EXPECT_EQ(lastErrorSentence(), file + ", line 3: the key \"listen\" is not known.");
+    EXPECT_EQ(lastErrorSentence(), file + ", line 3: unknown key \"listen\".");
 }
 
 } // namespace

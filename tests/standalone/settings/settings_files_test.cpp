@@ -1,7 +1,5 @@
 #include "standalone/settings/settings_files.h"
 
-#include "standalone/core/last_error.h"
-
 #include <gtest/gtest.h>
 
 #include <cstring>
@@ -86,9 +84,8 @@ std::string replaced(std::string text, const std::string& from, const std::strin
 }
 
 std::string problemOf(const std::string& text) {
-    clearLastError();
-    EXPECT_FALSE(parseFtpSettings("ftp.conf", text).has_value());
-    return lastErrorSentence();
+    const auto settings = parseFtpSettings("ftp.conf", text);
+    return settings ? "" : settings.error().message;
 }
 
 bool isSameRecord(const _tag_VELT_FTP_CONF_& a, const _tag_VELT_FTP_CONF_& b) {
@@ -122,7 +119,7 @@ TEST(SettingsFiles, BytesBehindTheEndOfATextAreKept) {
 
     EXPECT_NE(text.find("\nport = \"21\\x001\"\n"), std::string::npos);
     const auto read = parseFtpSettings("ftp.conf", text);
-    ASSERT_TRUE(read.has_value()) << lastErrorSentence();
+    ASSERT_TRUE(read) << read.error().message;
     EXPECT_TRUE(isSameRecord(read->record, settings.record));
 }
 
@@ -142,7 +139,7 @@ TEST(SettingsFiles, ARecordOfAnyBytesComesBackTheSame) {
         settings.umask = i % 7 == 0;
 
         const auto read = parseFtpSettings("ftp.conf", formatFtpSettings(settings));
-        ASSERT_TRUE(read.has_value()) << lastErrorSentence();
+        ASSERT_TRUE(read) << read.error().message;
         ASSERT_TRUE(isSameRecord(read->record, settings.record));
         EXPECT_EQ(read->timeout, settings.timeout);
         EXPECT_EQ(read->useUtf8, settings.useUtf8);
@@ -155,7 +152,7 @@ TEST(SettingsFiles, ARecordOfAnyBytesComesBackTheSame) {
 TEST(SettingsFiles, AHandWrittenFileMayBeSpacedAndOrderedOtherwise) {
     const auto read =
         parseSftpSettings("sftp.conf", "port=2022\r\n\t# mine\r\n   enabled\t =  1 \r\nversion=1");
-    ASSERT_TRUE(read.has_value()) << lastErrorSentence();
+    ASSERT_TRUE(read) << read.error().message;
     EXPECT_TRUE(read->enabled);
     EXPECT_EQ(read->port, 2022);
 }
@@ -170,7 +167,7 @@ TEST(SettingsFiles, EveryMissingKeyIsNamed) {
             continue;
         const std::string key = line.substr(0, line.find(' '));
         EXPECT_EQ(problemOf(replaced(golden, "\n" + line + "\n", "\n")),
-                  "Settings file ftp.conf: the key " + key + " is missing.");
+                  "Cannot read ftp.conf: missing key \"" + key + "\".");
         ++keys;
     }
     EXPECT_EQ(keys, 22);
@@ -182,47 +179,49 @@ TEST(SettingsFiles, DamageIsNamedByFileAndLine) {
         const char* to;
         const char* problem;
     } cases[] = {
-        {"timeout = 300", "timeout = 3oo", "line 43: the value of timeout is no whole number of 32 bits"},
-        {"timeout = 300", "timeout =", "line 43: the value of timeout is no whole number of 32 bits"},
+        {"timeout = 300", "timeout = 3oo",
+         "line 43: timeout: expected a number from -2147483648 to 2147483647"},
+        {"timeout = 300", "timeout =", "line 43: timeout: expected a number from -2147483648 to 2147483647"},
         {"timeout = 300", "timeout = 2147483648",
-         "line 43: the value of timeout is no whole number of 32 bits"},
-        {"timeout = 300", "timeout = +1", "line 43: the value of timeout is no whole number of 32 bits"},
-        {"timeout = 300", "timeout 300", "line 43: this is no line of the form \"key = value\""},
-        {"timeout = 300", "= 300", "line 43: this is no line of the form \"key = value\""},
-        {"timeout = 300", "timeout = 300\ntime_out = 3", "line 44: the key \"time_out\" is not known"},
-        {"timeout = 300", "timeout = 300\ntimeout = 3",
-         "line 44: the key \"timeout\" stands there a second time"},
-        {"umask = 1", "umask = yes", "line 40: the value of umask is neither 0 nor 1"},
-        {"umask = 1", "umask = 2", "line 40: the value of umask is neither 0 nor 1"},
-        {"port = \"21\"", "port = 21", "line 6: the value of port is no text in double quotes"},
-        {"port = \"21\"", "port = \"123456789\"", "line 6: the value of port is longer than 8 bytes"},
-        {"version = 1", "version = 2", "line 3: version 2 is not known here; the newest known version is 1"},
-        {"version = 1", "version = 0", "line 3: version 0 is not known here; the newest known version is 1"},
+         "line 43: timeout: expected a number from -2147483648 to 2147483647"},
+        {"timeout = 300", "timeout = +1",
+         "line 43: timeout: expected a number from -2147483648 to 2147483647"},
+        {"timeout = 300", "timeout 300", "line 43: expected \"key = value\""},
+        {"timeout = 300", "= 300", "line 43: expected \"key = value\""},
+        {"timeout = 300", "timeout = 300\ntime_out = 3", "line 44: unknown key \"time_out\""},
+        {"timeout = 300", "timeout = 300\ntimeout = 3", "line 44: duplicate key \"timeout\""},
+        {"umask = 1", "umask = yes", "line 40: umask: expected 0 or 1"},
+        {"umask = 1", "umask = 2", "line 40: umask: expected 0 or 1"},
+        {"port = \"21\"", "port = 21", "line 6: port: expected a text in double quotes"},
+        {"port = \"21\"", "port = \"123456789\"", "line 6: port: expected at most 8 bytes"},
+        {"version = 1", "version = 2",
+         "line 3: version 2 is newer than this program, which knows files up to version 1"},
+        {"version = 1", "version = 0", "line 3: version: expected 1"},
     };
     for (const auto& one : cases)
         EXPECT_EQ(problemOf(replaced(goldenFtp, one.from, one.to)),
-                  std::string("Settings file ftp.conf, ") + one.problem + ".");
+                  std::string("Cannot read ftp.conf, ") + one.problem + ".");
 }
 
 TEST(SettingsFiles, AnEmptyOrOverwrittenFileIsDamaged) {
-    EXPECT_EQ(problemOf(""), "Settings file ftp.conf: the key version is missing.");
-    EXPECT_EQ(problemOf(std::string(4096, '\0')),
-              "Settings file ftp.conf, line 1: this is no line of the form \"key = value\".");
+    EXPECT_EQ(problemOf(""), "Cannot read ftp.conf: missing key \"version\".");
+    EXPECT_EQ(problemOf(std::string(4096, '\0')), "Cannot read ftp.conf, line 1: expected \"key = value\".");
     EXPECT_EQ(problemOf("\x7f"
                         "ELF\x02\x01"),
-              "Settings file ftp.conf, line 1: this is no line of the form \"key = value\".");
+              "Cannot read ftp.conf, line 1: expected \"key = value\".");
 }
 
 TEST(SettingsFiles, ANewerVersionIsRefusedWhateverElseItHolds) {
     EXPECT_EQ(problemOf("version = 7\nport = 21\nsomething_new = {}\n"),
-              "Settings file ftp.conf, line 1: version 7 is not known here; the newest known version is 1.");
+              "Cannot read ftp.conf, line 1: version 7 is newer than this program, which knows files up to "
+              "version 1.");
 }
 
 TEST(SettingsFiles, EveryTruncationIsRefused) {
     const std::string golden = goldenFtp;
     // Without the last line end the last value is still whole.
     for (std::size_t length = 0; length < golden.size() - 1; ++length)
-        ASSERT_FALSE(parseFtpSettings("ftp.conf", golden.substr(0, length)).has_value()) << length;
+        ASSERT_FALSE(parseFtpSettings("ftp.conf", golden.substr(0, length))) << length;
 }
 
 } // namespace

@@ -51,8 +51,7 @@ TEST_F(SettingsStore, ADamagedExternalAddressIsAnErrorThatCanBeRepaired) {
 TEST_F(SettingsStore, AnUnreadableFileIsNoMissingFile) {
     std::filesystem::create_directories(place("/etc/velt/ftp.conf"));
     EXPECT_FALSE(loadFtpSettings().has_value());
-    EXPECT_EQ(lastErrorSentence(),
-              "Cannot read the settings file " + place("/etc/velt/ftp.conf") + ": Is a directory.");
+    EXPECT_EQ(lastErrorSentence(), "Cannot read " + place("/etc/velt/ftp.conf") + ": Is a directory.");
 }
 
 TEST_F(SettingsStore, AHandEditedValueThatNoDaemonTakesIsRepairedByStoringAGoodOne) {

@@ -1,4 +1,4 @@
-#include "standalone/settings/settings_text.h"
+#include "standalone/core/quoted_text.h"
 
 #include <gtest/gtest.h>
 
@@ -8,8 +8,7 @@ namespace velt {
 namespace {
 
 std::string unquoted(std::string_view quoted) {
-    std::string text;
-    return readQuotedText(quoted, text) ? text : "(refused)";
+    return readQuotedText(quoted).value_or("(refused)");
 }
 
 TEST(QuotedText, LeavesReadableTextReadable) {

@@ -1,4 +1,4 @@
-#include "standalone/settings/settings_text.h"
+#include "standalone/core/quoted_text.h"
 
 namespace velt {
 
@@ -14,9 +14,9 @@ bool isContinuation(unsigned char byte) {
     return (byte & 0xc0) == 0x80;
 }
 
-// The length of the well-formed UTF-8 sequence of two to four bytes at the front of the text that stands for
-// something printable, or 0: the over-long forms, the surrogates, what lies above U+10FFFF, and the control
-// characters U+0080 to U+009F, which a terminal would obey, are not among them.
+// The length of the printable UTF-8 sequence of two to four bytes at the front of the text, or 0. Overlong
+// forms, surrogates, what lies above U+10FFFF and the control characters U+0080 to U+009F, which a terminal
+// would obey, are not printable.
 std::size_t printableSequence(std::string_view text) {
     const unsigned char lead = byteAt(text, 0);
     const unsigned char second = byteAt(text, 1);
@@ -36,7 +36,7 @@ int hexValue(char digit) {
     return at == std::string_view::npos ? -1 : static_cast<int>(at);
 }
 
-// Reads the escape whose backslash stands at the front; its length, or 0 when there is none.
+// Reads the escape at the front, which begins with a backslash; its length, or 0 when it is not one of ours.
 std::size_t readEscape(std::string_view text, char& byte) {
     if (text.size() < 2)
         return 0;
@@ -79,11 +79,11 @@ std::string quotedText(std::string_view text) {
     return quoted + '"';
 }
 
-bool readQuotedText(std::string_view quoted, std::string& text) {
+std::optional<std::string> readQuotedText(std::string_view quoted) {
     if (quoted.size() < 2 || quoted.front() != '"' || quoted.back() != '"')
-        return false;
+        return std::nullopt;
     quoted = quoted.substr(1, quoted.size() - 2);
-    text.clear();
+    std::string text;
     while (!quoted.empty()) {
         char byte = quoted.front();
         std::size_t taken = 1;
@@ -92,11 +92,11 @@ bool readQuotedText(std::string_view quoted, std::string& text) {
         else if (byte == '"')
             taken = 0;
         if (taken == 0)
-            return false;
+            return std::nullopt;
         text += byte;
         quoted.remove_prefix(taken);
     }
-    return true;
+    return text;
 }
 
 } // namespace velt

@@ -1,0 +1,179 @@
+#include "standalone/core/strict_file.h"
+
+#include "standalone/core/error_number.h"
+#include "standalone/core/file_store.h"
+#include "standalone/core/quoted_text.h"
+
+#include <cerrno>
+#include <charconv>
+#include <cstring>
+
+namespace velt {
+
+namespace {
+
+constexpr std::string_view versionKey = "version";
+
+std::string_view trimmed(std::string_view text) {
+    constexpr std::string_view blanks = " \t\r";
+    const auto first = text.find_first_not_of(blanks);
+    if (first == std::string_view::npos)
+        return {};
+    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+std::string_view withoutComment(std::string_view line) {
+    bool quoted = false;
+    for (std::size_t at = 0; at < line.size(); ++at) {
+        if (line[at] == '"')
+            quoted = !quoted;
+        else if (quoted && line[at] == '\\')
+            ++at;
+        else if (!quoted && line[at] == '#')
+            return line.substr(0, at);
+    }
+    return line;
+}
+
+std::optional<std::int64_t> parseNumber(std::string_view text) {
+    std::int64_t number = 0;
+    const char* const textEnd = text.data() + text.size();
+    const auto [end, error] = std::from_chars(text.data(), textEnd, number);
+    return error == std::errc() && end == textEnd ? std::optional(number) : std::nullopt;
+}
+
+} // namespace
+
+std::string numberText(std::int64_t least, std::int64_t most) {
+    if (least == most)
+        return std::to_string(least);
+    return "a number from " + std::to_string(least) + " to " + std::to_string(most);
+}
+
+Result<StrictFile> StrictFile::load(const std::filesystem::path& path, FileVersions versions) {
+    if (const auto contents = readFile(path))
+        return parse(path.string(), *contents, versions);
+    if (errno == ENOENT)
+        return StrictFile(path.string());
+    return Error(ErrorNumber::store, "Cannot read " + path.string() + ": " + std::strerror(errno) + ".");
+}
+
+Result<StrictFile> StrictFile::parse(std::string name, std::string_view contents, FileVersions versions) {
+    StrictFile file(std::move(name));
+    int number = 0;
+    for (std::size_t at = 0; at < contents.size();) {
+        const std::string_view line = contents.substr(at, contents.find('\n', at) - at);
+        file.readLine(line, ++number);
+        at += line.size() + 1;
+    }
+    // A newer version tells more than a line whose form only that version knows.
+    if (Result<> read = file.readVersion(versions); !read)
+        return read.error();
+    if (file.problem_)
+        return *file.problem_;
+    return file;
+}
+
+void StrictFile::readLine(std::string_view line, int number) {
+    const std::string_view content = trimmed(withoutComment(line));
+    if (content.empty())
+        return;
+    const auto equals = content.find('=');
+    const std::string_view key = trimmed(content.substr(0, equals));
+    if (equals == std::string_view::npos || key.empty())
+        return note(problemAt(number, "expected \"key = value\""));
+    const std::string_view value = trimmed(content.substr(equals + 1));
+    if (!values_.emplace(key, Value{std::string(value), number}).second)
+        note(problemAt(number, "duplicate key " + quotedText(key)));
+}
+
+Result<> StrictFile::readVersion(FileVersions versions) {
+    const auto found = values_.find(versionKey);
+    if (found == values_.end()) {
+        version_ = 1;
+        if (versions.required && !problem_)
+            return problemAt(0, "missing key " + quotedText(versionKey));
+        return {};
+    }
+    found->second.asked = true;
+    const auto version = parseNumber(found->second.text);
+    if (!version || *version < 1)
+        return problemAt(found->second.line, "version: expected " + numberText(1, versions.newest));
+    if (*version > versions.newest)
+        return problemAt(found->second.line,
+                         "version " + std::to_string(*version) +
+                             " is newer than this program, which knows files up to version " +
+                             std::to_string(versions.newest));
+    version_ = static_cast<int>(*version);
+    return {};
+}
+
+std::optional<std::string> StrictFile::value(std::string_view key, int since) {
+    const auto found = values_.find(key);
+    if (found != values_.end()) {
+        found->second.asked = true;
+        return found->second.text;
+    }
+    if (since <= version_)
+        note(problemAt(0, "missing key " + quotedText(key)));
+    return std::nullopt;
+}
+
+std::int64_t StrictFile::number(std::string_view key, std::int64_t least, std::int64_t most,
+                                std::int64_t fallback, int since) {
+    const auto text = value(key, since);
+    if (!text)
+        return fallback;
+    const auto number = parseNumber(*text);
+    if (number && *number >= least && *number <= most)
+        return *number;
+    refuse(key, numberText(least, most));
+    return fallback;
+}
+
+bool StrictFile::boolean(std::string_view key, bool fallback, int since) {
+    const auto text = value(key, since);
+    if (!text)
+        return fallback;
+    if (*text != "0" && *text != "1")
+        refuse(key, "0 or 1");
+    return *text == "1";
+}
+
+std::string StrictFile::text(std::string_view key, std::size_t limit, std::string fallback, int since) {
+    const auto quoted = value(key, since);
+    if (!quoted)
+        return fallback;
+    auto text = readQuotedText(*quoted);
+    if (text && text->size() <= limit)
+        return *std::move(text);
+    refuse(key, text ? "at most " + std::to_string(limit) + " bytes" : "a text in double quotes");
+    return fallback;
+}
+
+void StrictFile::refuse(std::string_view key, std::string_view expected) {
+    const auto found = values_.find(key);
+    note(problemAt(found == values_.end() ? 0 : found->second.line,
+                   std::string(key).append(": expected ").append(expected)));
+}
+
+Result<> StrictFile::finish() {
+    if (problem_)
+        return *problem_;
+    for (const auto& [key, value] : values_)
+        if (!value.asked)
+            return problemAt(value.line, "unknown key " + quotedText(key));
+    return {};
+}
+
+Error StrictFile::problemAt(int line, const std::string& what) const {
+    const std::string place = line == 0 ? "" : ", line " + std::to_string(line);
+    return {ErrorNumber::damaged, "Cannot read " + name_ + place + ": " + what + "."};
+}
+
+void StrictFile::note(Error problem) {
+    if (!problem_)
+        problem_ = std::move(problem);
+}
+
+} // namespace velt
