@@ -13,7 +13,7 @@ namespace {
 constexpr long preconditionFailed = 412;
 constexpr int mostAttempts = 20;
 
-/// Somebody else has changed something since it was read.
+/// Something was changed since it was read.
 struct Outdated {};
 
 std::string pathOf(const ApiMethod& method) {
@@ -37,13 +37,11 @@ Json::Value ApiClient::exchange(const std::string& method, const std::string& pa
         return {};
     }
     if (answer.status != 200 && answer.status != 201) {
-        throw failureFrom(answer, server());
+        throw failureFrom(answer, server(), method == "GET");
     }
-    std::string problem;
-    const std::optional<Json::Value> value = parseJson(answer.body, problem);
+    const std::optional<Json::Value> value = parseJson(answer.body);
     if (!value) {
-        throw Failure(ExitCode::access, "The answer from " + server().name() + " is not JSON.",
-                      "Check that the address is that of veltd (--url, VELT_URL).");
+        throw Failure(ExitCode::access, "The answer from " + server().name() + " is not JSON.", checkAddress);
     }
     return *value;
 }
@@ -72,8 +70,8 @@ void ApiClient::changeWhatWasRead(const std::function<void()>& change) {
         }
     }
     watching_ = false;
-    throw Failure(ExitCode::conflict, "Others change the settings all the time.",
-                  "Try again when they have finished. Nothing was changed.");
+    throw Failure(ExitCode::conflict, "Others keep changing the settings at the same time.",
+                  "Try again later.", {"Nothing was changed."});
 }
 
 Json::Value ApiClient::get(const std::string& path) {
@@ -91,9 +89,9 @@ void ApiClient::remove(const std::string& path) {
 void ApiClient::follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
                        const std::function<bool()>& stop) {
     const HttpAnswer answer = http_.follow(path, onText, stop);
-    // No status at all: stopped before the server answered.
+    // The status is 0 when this was stopped before the server answered.
     if (answer.status != 200 && answer.status != 0) {
-        throw failureFrom(answer, server());
+        throw failureFrom(answer, server(), true);
     }
 }
 

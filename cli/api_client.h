@@ -30,12 +30,12 @@ public:
     /// Any method with its parameters. Null when the method answers without a value.
     Json::Value call(const ApiMethod& method, const Json::Value& parameters);
 
-    /// Runs `change`, which reads what it builds upon and then calls what it changes. When somebody else
-    /// changes something in between, the server refuses the call and the whole of `change` runs again, with
-    /// what is true then; Failure (conflict) when that happens again and again.
+    /// Runs `change`, which reads what it builds upon and then calls what it changes. When something is
+    /// changed by others in between, the server refuses the call and the whole of `change` runs again from
+    /// what is true then; Failure (conflict) when that happens too often.
     void changeWhatWasRead(const std::function<void()>& change);
 
-    /// The endpoints beside the methods; `path` starts with a slash.
+    /// For the paths of the server that are not methods; `path` starts with a slash.
     Json::Value get(const std::string& path);
     Json::Value post(const std::string& path, const Json::Value& body);
     void remove(const std::string& path);

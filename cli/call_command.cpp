@@ -19,8 +19,7 @@ struct CallOptions {
 
 void listMethods(Context& context) {
     const Json::Value answer = context.api.get("/api");
-    if (context.json) {
-        writeJson(context.console.out, answer);
+    if (context.wroteJson(answer)) {
         return;
     }
     Table table({"API", "VERSION", "METHOD", "CHANGES"});
@@ -37,19 +36,15 @@ void callMethod(Context& context, const CallOptions& options) {
         return;
     }
     if (options.method.method.empty()) {
-        throw Failure(ExitCode::usage, "call needs API, VERSION and METHOD.",
-                      "'veltctl call --list' shows what the server can do.");
+        throw Failure(ExitCode::usage, "call needs an API, a version and a method.",
+                      "See 'veltctl call --list' for the methods.");
     }
     const std::string text = options.parameters == "-" ? readInput(context.console, "-") : options.parameters;
-    std::string problem;
-    const std::optional<Json::Value> parameters = parseJson(text, problem);
+    std::string reason;
+    const std::optional<Json::Value> parameters = parseJson(text, &reason);
     if (!parameters || !parameters->isObject()) {
-        Failure failure(ExitCode::usage, "The parameters are no JSON object.",
-                        "Give an object such as '{\"enable_ftp\": true}', in quotes for the shell.");
-        if (!problem.empty()) {
-            failure.note(problem);
-        }
-        throw Failure(failure);
+        throw Failure(ExitCode::usage, "The parameters are not a JSON object.",
+                      "Pass an object such as '{\"enable_ftp\": true}', quoted for the shell.", {reason});
     }
     const Json::Value answer = context.api.call(options.method, *parameters);
     if (!answer.isNull()) {
@@ -62,7 +57,7 @@ void callMethod(Context& context, const CallOptions& options) {
 void addCallCommand(CLI::App& app, Command& chosen) {
     auto options = std::make_shared<CallOptions>();
     CLI::App* call = app.add_subcommand("call", "Call any method of any API and show its answer as JSON");
-    call->add_flag("--list", options->list, "List the methods that the server has");
+    call->add_flag("--list", options->list, "List the methods of the server");
     call->add_option("api", options->method.api, "Name of the API")->type_name("");
     call->add_option("version", options->method.version, "Version of the API")
         ->check(CLI::PositiveNumber)
@@ -70,8 +65,7 @@ void addCallCommand(CLI::App& app, Command& chosen) {
     call->add_option("method", options->method.method, "Name of the method")->type_name("");
     call->add_option("parameters", options->parameters, "A JSON object, or - for the standard input")
         ->type_name("");
-    call->callback(
-        [&chosen, options] { chosen = [options](Context& context) { callMethod(context, *options); }; });
+    onWords(call, chosen, [options](Context& context) { callMethod(context, *options); });
 }
 
 } // namespace velt::cli

@@ -1,6 +1,7 @@
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/printable.h"
 #include "cli/rule_list.h"
 #include "cli/text_table.h"
 
@@ -19,13 +20,12 @@ struct RuleOptions {
 };
 
 void writeRules(Context& context, const ChrootRules& rules) {
-    if (context.json) {
-        Json::Value result;
-        result["rules"] = rulesToJson(rules);
-        writeJson(context.console.out, result);
+    Json::Value result;
+    result["rules"] = rulesToJson(rules);
+    if (context.wroteJson(result)) {
         return;
     }
-    Table table({"TYPE", "NAME", "DIRECTORY"});
+    Table table({"TYPE", "NAME", "FOLDER"});
     for (const ChrootRule& rule : rules) {
         table.add({rule.type, rule.name, rule.path});
     }
@@ -34,11 +34,10 @@ void writeRules(Context& context, const ChrootRules& rules) {
 
 void showRules(Context& context) {
     const Json::Value answer = context.api.read({chrootApi, 2, "load"});
-    if (context.json) {
-        writeJson(context.console.out, answer);
+    if (context.wroteJson(answer)) {
         return;
     }
-    Table table({"TYPE", "NAME", "DIRECTORY", "EXISTS"});
+    Table table({"TYPE", "NAME", "FOLDER", "EXISTS"});
     for (const Json::Value& rule : answer["rules"]) {
         table.add({textAt(rule, "type"), textAt(rule, "name"), textAt(rule, "path"),
                    rule["path_exist"] == true ? "yes" : "no"});
@@ -47,34 +46,23 @@ void showRules(Context& context) {
 }
 
 void replaceRules(Context& context, const RuleOptions& options) {
-    std::string problem;
-    const std::optional<Json::Value> document = parseJson(readInput(context.console, options.file), problem);
-    if (!document) {
-        throw Failure(ExitCode::refused, options.file + " is not JSON.", "Correct it; nothing was changed.",
-                      {problem});
-    }
+    const Json::Value document = readJsonFile(context.console, options.file);
     std::vector<std::string> faults;
-    const Json::Value& array = document->isObject() ? (*document)["rules"] : *document;
-    const ChrootRules rules = rulesFromJson(array, faults);
+    const ChrootRules rules = rulesFromJson(document.isObject() ? document["rules"] : document, faults);
     if (!faults.empty()) {
-        Failure failure(
-            ExitCode::refused, options.file + " holds no valid set of rules.",
-            "Correct it; nothing was changed. 'veltctl chroot rules load --json' shows the form.");
-        for (const std::string& fault : faults) {
-            failure.note(fault);
-        }
-        throw Failure(failure);
+        faults.emplace_back("Nothing was changed.");
+        throw Failure(ExitCode::refused, "Invalid chroot rules in " + inputName(options.file) + ".",
+                      "Correct them; 'veltctl chroot rules load --json' shows how rules are written.",
+                      faults);
     }
     context.api.changeWhatWasRead([&] { saveRules(context.api, rules, loadRules(context.api)); });
     writeRules(context, rules);
 }
 
 void addRule(Context& context, const RuleOptions& options) {
-    std::vector<std::string> faults;
-    rulesFromJson(rulesToJson({options.rule}), faults);
-    if (!faults.empty()) {
-        throw Failure(ExitCode::usage, faults.front().substr(faults.front().find(": ") + 2) + ".",
-                      "For example: veltctl chroot rules add user NAME /SHARE");
+    if (const auto fault = faultOf(options.rule)) {
+        throw Failure(ExitCode::usage, "Invalid rule: " + *fault + ".",
+                      "Write it as in 'veltctl chroot rules add user NAME /SHARE'.");
     }
     ChrootRules rules;
     context.api.changeWhatWasRead([&] {
@@ -88,17 +76,17 @@ void addRule(Context& context, const RuleOptions& options) {
     writeRules(context, rules);
 }
 
-// The rules without those that the options name; Failure when there is none of these.
+// Failure when there is nothing to remove.
 ChrootRules rulesWithout(ChrootRules rules, const ChrootRule& wanted) {
     const std::size_t removed = std::erase_if(rules, [&](const ChrootRule& rule) {
         return rule.type == wanted.type && rule.name == wanted.name &&
                (wanted.path.empty() || rule.path == wanted.path);
     });
     if (removed == 0) {
-        const std::string place = wanted.path.empty() ? "" : " with the directory " + wanted.path;
+        const std::string folder = wanted.path.empty() ? "" : " with the folder " + wanted.path;
         throw Failure(ExitCode::refused,
-                      "There is no rule for the " + wanted.type + " " + wanted.name + place + ".",
-                      "'veltctl chroot rules load' shows the rules. Nothing was changed.");
+                      "There is no rule for the " + wanted.type + " " + wanted.name + folder + ".",
+                      "See 'veltctl chroot rules load' for the rules.");
     }
     return rules;
 }
@@ -136,8 +124,7 @@ void listUsers(Context& context, const UserOptions& options) {
         parameters["substr"] = options.filter;
     }
     const Json::Value answer = context.api.call({chrootApi, 1, "list"}, parameters);
-    if (context.json) {
-        writeJson(context.console.out, answer);
+    if (context.wroteJson(answer)) {
         return;
     }
     Table table({"USER", "DESCRIPTION"});
@@ -154,8 +141,7 @@ void changeUsers(Context& context, const UserOptions& options, const char* metho
         parameters["id"].append(name);
     }
     const Json::Value answer = context.api.call({chrootApi, 1, method}, parameters);
-    if (context.json) {
-        writeJson(context.console.out, answer.isNull() ? parameters : answer);
+    if (context.wroteJson(answer.isNull() ? parameters : answer)) {
         return;
     }
     for (const std::string& name : options.names) {
@@ -169,44 +155,40 @@ void addUserCommands(CLI::App& chroot, Command& chosen) {
     users->require_subcommand(1);
     CLI::App* list = users->add_subcommand("list", "List the confined users");
     list->add_flag("--others", options->others, "List the users who are not confined");
-    list->add_option("--offset", options->offset, "Index of the first user")->type_name("N");
-    list->add_option("--limit", options->limit, "Number of users (default: all)")->type_name("N");
+    list->add_option("--offset", options->offset, "Number of users to skip")->type_name("N");
+    list->add_option("--limit", options->limit, "Number of users to list (default: all)")->type_name("N");
     list->add_option("--type", options->source, "Where the users come from (default local)")
         ->check(CLI::IsMember({"local", "domain", "ldap", "all"}))
         ->type_name("local|domain|ldap|all");
-    list->add_option("--domain", options->domain, "Users of this domain")->type_name("NAME");
-    list->add_option("--filter", options->filter, "Users whose name holds this text")->type_name("TEXT");
-    list->callback(
-        [&chosen, options] { chosen = [options](Context& context) { listUsers(context, *options); }; });
+    list->add_option("--domain", options->domain, "Only users of this domain")->type_name("NAME");
+    list->add_option("--filter", options->filter, "Only users whose name contains this text")
+        ->type_name("TEXT");
+    onWords(list, chosen, [options](Context& context) { listUsers(context, *options); });
 
     CLI::App* add = users->add_subcommand("add", "Confine users to their home folders");
-    CLI::App* remove = users->add_subcommand("delete", "Lift the confinement of users");
+    CLI::App* remove = users->add_subcommand("delete", "Stop confining users to their home folders");
     for (CLI::App* command : {add, remove}) {
-        command->add_option("user", options->names, "Names of users")->required()->type_name("");
+        command->add_option("user", options->names, "Name of a user, or several")->required()->type_name("");
     }
-    add->callback([&chosen, options] {
-        chosen = [options](Context& context) { changeUsers(context, *options, "add", ": confined"); };
-    });
-    remove->callback([&chosen, options] {
-        chosen = [options](Context& context) {
-            changeUsers(context, *options, "delete", ": no longer confined");
-        };
+    onWords(add, chosen,
+            [options](Context& context) { changeUsers(context, *options, "add", ": confined"); });
+    onWords(remove, chosen, [options](Context& context) {
+        changeUsers(context, *options, "delete", ": no longer confined");
     });
 }
 
 void addRuleCommands(CLI::App& chroot, Command& chosen) {
     auto options = std::make_shared<RuleOptions>();
-    CLI::App* rules = chroot.add_subcommand("rules", "Directories that users and groups are confined to");
+    CLI::App* rules = chroot.add_subcommand("rules", "Folders that users and groups are confined to");
     rules->require_subcommand(1);
     CLI::App* load = rules->add_subcommand("load", "Show all rules");
-    load->callback([&chosen] { chosen = showRules; });
+    onWords(load, chosen, showRules);
 
-    CLI::App* save = rules->add_subcommand("save", "Replace all rules by those of a JSON file");
+    CLI::App* save = rules->add_subcommand("save", "Replace all rules with those of a JSON file");
     save->add_option("file", options->file, "The file, or - for the standard input")
         ->required()
         ->type_name("");
-    save->callback(
-        [&chosen, options] { chosen = [options](Context& context) { replaceRules(context, *options); }; });
+    onWords(save, chosen, [options](Context& context) { replaceRules(context, *options); });
 
     CLI::App* add = rules->add_subcommand("add", "Add a rule");
     CLI::App* remove = rules->add_subcommand("remove", "Remove the rules of a user or group");
@@ -219,20 +201,18 @@ void addRuleCommands(CLI::App& chroot, Command& chosen) {
             ->required()
             ->type_name("");
     }
-    add->add_option("directory", options->rule.path, "/home, /SHARE or /SHARE/FOLDER")
+    add->add_option("folder", options->rule.path, "/home, /SHARE or /SHARE/FOLDER")
         ->required()
         ->type_name("");
-    remove->add_option("directory", options->rule.path, "Only the rule with this directory")->type_name("");
-    add->callback(
-        [&chosen, options] { chosen = [options](Context& context) { addRule(context, *options); }; });
-    remove->callback(
-        [&chosen, options] { chosen = [options](Context& context) { removeRule(context, *options); }; });
+    remove->add_option("folder", options->rule.path, "Only the rule with this folder")->type_name("");
+    onWords(add, chosen, [options](Context& context) { addRule(context, *options); });
+    onWords(remove, chosen, [options](Context& context) { removeRule(context, *options); });
 }
 
 } // namespace
 
 void addChrootCommands(CLI::App& app, Command& chosen) {
-    CLI::App* chroot = app.add_subcommand("chroot", "Confine users and groups to directories");
+    CLI::App* chroot = app.add_subcommand("chroot", "Confine users and groups to folders");
     chroot->require_subcommand(1);
     addUserCommands(*chroot, chosen);
     addRuleCommands(*chroot, chosen);

@@ -17,13 +17,19 @@ struct Context {
     Console& console;
     ApiClient& api;
     bool json = false; ///< the output is for programs
+
+    /// Writes the value as JSON when the output is for programs. False when it is for people: nothing is
+    /// written.
+    bool wroteJson(const Json::Value& value) const;
 };
 
 /// A command, ready to run. Throws Failure.
 using Command = std::function<void(Context&)>;
 
-// Each adds commands with their options to the parser. The command that the words name is put into `chosen`,
-// which outlives the parser.
+/// Puts `command` into `chosen`, which outlives the parser, when the words name it.
+void onWords(CLI::App* words, Command& chosen, const Command& command);
+
+// Each adds commands with their options to the parser; see onWords for `chosen`.
 void addSettingsCommands(CLI::App& app, Command& chosen);
 void addShareCommands(CLI::App& app, Command& chosen);
 void addChrootCommands(CLI::App& app, Command& chosen);

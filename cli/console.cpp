@@ -2,6 +2,8 @@
 
 #include "cli/failure.h"
 
+#include <cerrno>
+#include <cstring>
 #include <fstream>
 #include <istream>
 
@@ -20,10 +22,14 @@ std::string readInput(Console& console, const std::string& name) {
     }
     // A folder opens like a file; only reading it fails.
     if (source.bad() || (name != "-" && !file.is_open())) {
-        throw Failure(ExitCode::usage, "The file " + name + " cannot be read.",
+        throw Failure(ExitCode::usage, "Cannot read " + inputName(name) + ": " + std::strerror(errno) + ".",
                       "Name a readable file, or - for the standard input.");
     }
     return text;
+}
+
+std::string inputName(const std::string& name) {
+    return name == "-" ? "standard input" : name;
 }
 
 } // namespace velt::cli

@@ -2,10 +2,11 @@
 #include "cli/failure.h"
 #include "cli/json_io.h"
 #include "cli/settings_document.h"
-#include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
+#include <cerrno>
+#include <cstring>
 #include <fstream>
 #include <memory>
 #include <ostream>
@@ -29,28 +30,20 @@ void exportTo(Context& context, const std::string& name) {
     writeJson(file, document);
     file.close();
     if (!file) {
-        throw Failure(ExitCode::local, "The file " + name + " cannot be written.",
-                      "Name a file in a folder where you may write, with space left.");
+        throw Failure(ExitCode::local, "Cannot write " + name + ": " + std::strerror(errno) + ".",
+                      "Name a file in a folder that you may write to and that has space left.");
     }
 }
 
 Json::Value readDocument(Context& context, const std::string& name) {
-    std::string problem;
-    const std::optional<Json::Value> document = parseJson(readInput(context.console, name), problem);
-    if (!document) {
-        throw Failure(ExitCode::refused, name + " is not JSON.", "Correct it; nothing was changed.",
-                      {problem});
-    }
-    const std::vector<std::string> faults = documentFaults(*document);
+    Json::Value document = readJsonFile(context.console, name);
+    std::vector<std::string> faults = documentFaults(document);
     if (!faults.empty()) {
-        Failure failure(ExitCode::refused, name + " is no document of settings.",
-                        "Correct it; nothing was changed. 'veltctl export' writes such a document.");
-        for (const std::string& fault : faults) {
-            failure.note(fault);
-        }
-        throw Failure(failure);
+        faults.emplace_back("Nothing was changed.");
+        throw Failure(ExitCode::refused, "Invalid settings in " + inputName(name) + ".",
+                      "Correct it; 'veltctl export' writes a valid one.", faults);
     }
-    return *document;
+    return document;
 }
 
 void writeStep(Context& context, const ImportStep& step) {
@@ -91,11 +84,9 @@ void applySteps(Context& context, const ImportPlan& plan) {
             }
         }
     } catch (Failure& failure) {
-        failure.note("in the section " + plan.steps[applied].section);
         for (std::size_t i = 0; i < plan.steps.size(); ++i) {
-            if (i != applied) {
-                failure.note(plan.steps[i].section + (i < applied ? ": was applied" : ": was not applied"));
-            }
+            const char* const state = i < applied ? ": applied" : i == applied ? ": failed" : ": not applied";
+            failure.note(plan.steps[i].section + state);
         }
         writeResult(context, plan, applied, false);
         throw;
@@ -123,19 +114,16 @@ void importFrom(Context& context, const DocumentOptions& options) {
 void addDocumentCommands(CLI::App& app, Command& chosen) {
     auto options = std::make_shared<DocumentOptions>();
     CLI::App* save = app.add_subcommand("export", "Write all settings as one JSON document");
-    save->add_option("-o,--output", options->file, "The file to write (default: the standard output)")
+    save->add_option("-o,--output", options->file, "The file to write (default: standard output)")
         ->type_name("FILE");
-    save->callback(
-        [&chosen, options] { chosen = [options](Context& context) { exportTo(context, options->file); }; });
+    onWords(save, chosen, [options](Context& context) { exportTo(context, options->file); });
 
-    CLI::App* load =
-        app.add_subcommand("import", "Bring the settings to those of a document, and say what changes");
-    load->add_option("file", options->file, "The document, or - for the standard input")
+    CLI::App* load = app.add_subcommand("import", "Apply the settings of a document and show what changes");
+    load->add_option("file", options->file, "The document, or - for standard input")
         ->required()
         ->type_name("");
-    load->add_flag("-n,--dry-run", options->dryRun, "Only say what would change");
-    load->callback(
-        [&chosen, options] { chosen = [options](Context& context) { importFrom(context, *options); }; });
+    load->add_flag("-n,--dry-run", options->dryRun, "Only show what would change");
+    onWords(load, chosen, [options](Context& context) { importFrom(context, *options); });
 }
 
 } // namespace velt::cli

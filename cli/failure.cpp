@@ -1,15 +1,19 @@
 #include "cli/failure.h"
 
-#include "cli/text_table.h"
+#include "cli/printable.h"
 
 #include <ostream>
+#include <sstream>
 
 namespace velt::cli {
 
 void writeFailure(std::ostream& out, const Failure& failure) {
     out << "veltctl: " << printable(failure.what()) << '\n';
     for (const std::string& note : failure.notes()) {
-        out << "  " << printable(note) << '\n';
+        std::istringstream lines(note);
+        for (std::string line; std::getline(lines, line);) {
+            out << "  " << printable(line) << '\n';
+        }
     }
     if (!failure.hint().empty()) {
         out << "What to do: " << printable(failure.hint()) << '\n';

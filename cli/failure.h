@@ -1,4 +1,4 @@
-// Why a command ends without having done its work.
+// Why a command failed.
 #ifndef VELT_CLI_FAILURE_H
 #define VELT_CLI_FAILURE_H
 
@@ -13,7 +13,8 @@ namespace velt::cli {
 
 class Failure : public std::runtime_error {
 public:
-    /// `message` is one sentence without a name in front; `hint` says what to do next and may be empty.
+    /// `message` is one sentence, without a program's name; `notes` are lines of explanation below it; `hint`
+    /// says what to do next and may be empty.
     Failure(ExitCode code, const std::string& message, std::string hint = {},
             std::vector<std::string> notes = {})
         : std::runtime_error(message), code_(code), hint_(std::move(hint)), notes_(std::move(notes)) {}

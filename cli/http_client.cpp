@@ -32,8 +32,7 @@ bool receive(Transfer& transfer, std::string_view text) {
         return !transfer.stopped;
     }
     if (transfer.answer.body.size() + text.size() > largestAnswer) {
-        throw Failure(ExitCode::access, "The answer is larger than any that the server gives.",
-                      "Check that the address is that of veltd.");
+        throw Failure(ExitCode::access, "The answer is too long to be from veltd.", checkAddress);
     }
     transfer.answer.body.append(text);
     return true;
@@ -72,31 +71,32 @@ void initialiseLibrary() {
 
 std::string hintFor(const ServerAddress& server, CURLcode code, long systemError) {
     if (code == CURLE_OPERATION_TIMEDOUT) {
-        return "The request may still take effect: look with 'veltctl status', or wait longer with "
-               "--timeout.";
+        return "The request may still take effect: check 'veltctl status', or wait longer with --timeout.";
     }
     if (code == CURLE_PEER_FAILED_VERIFICATION || code == CURLE_SSL_CACERT_BADFILE) {
         return "Name the certificate that signed the server's with --ca-file.";
     }
     if (server.socket.empty()) {
-        return "Check the address (--url, VELT_URL) and that veltd listens there.";
+        return "Check the address (--url or VELT_URL), and that veltd listens there.";
     }
     if (systemError == EACCES || systemError == EPERM) {
         return "Run veltctl as root or as a member of the group velt-admin.";
     }
-    return "Start veltd, or name its socket with --socket or VELT_SOCKET, or its address with --url or "
-           "VELT_URL.";
+    return "Start veltd, or say where it listens: at a Unix socket (--socket or VELT_SOCKET) or an address "
+           "(--url or VELT_URL).";
 }
 
-Failure noAnswer(const ServerAddress& server, CURL* curl, CURLcode code, const char* reason) {
+Failure noAnswer(const ServerAddress& server, CURL* curl, CURLcode code, const char* detail) {
     long systemError = 0;
     curl_easy_getinfo(curl, CURLINFO_OS_ERRNO, &systemError);
-    Failure failure(ExitCode::access, "No answer from " + server.name() + ".",
-                    hintFor(server, code, systemError));
     const bool connecting = code == CURLE_COULDNT_CONNECT && systemError != 0;
-    failure.note(connecting ? std::strerror(static_cast<int>(systemError))
-                            : (*reason != '\0' ? reason : curl_easy_strerror(code)));
-    return failure;
+    std::string reason = *detail != '\0' ? detail : curl_easy_strerror(code);
+    if (connecting) {
+        reason = std::strerror(static_cast<int>(systemError));
+    }
+    return {ExitCode::access,
+            (connecting ? "Cannot connect to " : "No answer from ") + server.name() + ": " + reason + ".",
+            hintFor(server, code, systemError)};
 }
 
 } // namespace
@@ -145,8 +145,7 @@ void HttpClient::prepare(const std::string& path) {
 
     curl_easy_setopt(curl, CURLOPT_URL, (server_.url + path).c_str());
     curl_easy_setopt(curl, CURLOPT_PROTOCOLS_STR, "http,https");
-    // A proxy from the environment would see the token, and a proxy cannot reach the loopback of this
-    // machine.
+    // A proxy from the environment would see the token, and could not reach this machine's loopback.
     curl_easy_setopt(curl, CURLOPT_PROXY, "");
     curl_easy_setopt(curl, CURLOPT_NOSIGNAL, 1L);
     curl_easy_setopt(curl, CURLOPT_ERRORBUFFER, handle_->reason);

@@ -15,7 +15,7 @@ namespace velt::cli {
 struct HttpAnswer {
     long status = 0;
     std::string body;
-    std::string etag; ///< "" when the server names no state
+    std::string etag; ///< empty when the server names no state
 };
 
 /// Not for use by several threads at once.
@@ -28,14 +28,14 @@ public:
 
     const ServerAddress& server() const { return server_; }
 
-    /// Sends one request; `path` starts with a slash and is encoded already, `body` is JSON. With an
-    /// `ifMatch` the server is to refuse when it is in another state. Any status is an answer. Throws Failure
-    /// (access) when there is none.
+    /// Sends one request; `path` starts with a slash and is already encoded, `body` is JSON. With an
+    /// `ifMatch` the server refuses the request unless it is in that state. Any status is an answer. Failure
+    /// (access) when there is no answer.
     HttpAnswer send(const std::string& method, const std::string& path,
                     const std::optional<std::string>& body, const std::string& ifMatch = {});
 
-    /// Hands what a GET of `path` delivers to `onText`, until the server ends it, `onText` returns false or
-    /// `stop` returns true (asked once a second at least). The body of an answer other than 200 is returned
+    /// Passes what a GET of `path` delivers to `onText`, until the server ends it, `onText` returns false or
+    /// `stop` returns true (asked at least once a second). The body of an answer other than 200 is returned
     /// instead.
     HttpAnswer follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
                       const std::function<bool()>& stop);

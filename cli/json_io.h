@@ -2,6 +2,8 @@
 #ifndef VELT_CLI_JSON_IO_H
 #define VELT_CLI_JSON_IO_H
 
+#include "cli/console.h"
+
 #include <json/value.h>
 
 #include <iosfwd>
@@ -10,8 +12,13 @@
 
 namespace velt::cli {
 
-/// The value of a JSON text, strictly read; nothing when it is none, with the reason in `problem`.
-std::optional<Json::Value> parseJson(const std::string& text, std::string& problem);
+/// The value of a JSON text, strictly parsed. Nothing for any other text; `reason`, when given, then says
+/// what is wrong with it, as "line 1, column 5: ...".
+std::optional<Json::Value> parseJson(const std::string& text, std::string* reason = nullptr);
+
+/// The value of a JSON file, or of the standard input for "-". Failure when it cannot be read (usage) or is
+/// not JSON (refused).
+Json::Value readJsonFile(Console& console, const std::string& name);
 
 /// On one line, without a line end.
 std::string compactJson(const Json::Value& value);
@@ -22,7 +29,8 @@ void writeJson(std::ostream& out, const Json::Value& value);
 /// A value as people read it: on and off for a bool, a text without quotes.
 std::string displayValue(const Json::Value& value);
 
-/// The text or number at a key of an object, as text; empty when the value is no object or has no such key.
+/// What an object has at the key, as displayValue; empty for a missing key, or when the value is not an
+/// object.
 std::string textAt(const Json::Value& object, const char* key);
 
 } // namespace velt::cli

@@ -1,6 +1,7 @@
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/printable.h"
 #include "cli/server_events.h"
 #include "cli/text_table.h"
 #include "cli/time_text.h"
@@ -38,8 +39,8 @@ std::string logPath(const LogOptions& options) {
     if (!options.since.empty()) {
         const std::optional<std::string> since = parseSince(options.since, std::time(nullptr));
         if (!since) {
-            throw Failure(ExitCode::usage, "\"" + options.since + "\" is no point in time.",
-                          "Give a time such as 2026-11-21T08:00:00Z, or an age such as 30m, 2h or 7d.");
+            throw Failure(ExitCode::usage, "Invalid time \"" + options.since + "\".",
+                          "Use a time such as 2026-11-21T08:00:00Z, or an age such as 30m, 2h or 7d.");
         }
         add("since", *since);
     }
@@ -55,11 +56,10 @@ std::string timeOf(const Json::Value& entry) {
 }
 
 void writeLog(Context& context, const Json::Value& entries, const Json::Value& next) {
-    if (context.json) {
-        Json::Value result;
-        result["entries"] = entries;
-        result["next"] = next;
-        writeJson(context.console.out, result);
+    Json::Value result;
+    result["entries"] = entries;
+    result["next"] = next;
+    if (context.wroteJson(result)) {
         return;
     }
     Table table({"ID", "TIME", "EVENT", "ACTOR", "ADDRESS", "TEXT"});
@@ -69,7 +69,7 @@ void writeLog(Context& context, const Json::Value& entries, const Json::Value& n
     }
     table.write(context.console.out);
     if (!next.isNull()) {
-        context.console.err << "Older entries: veltctl log --before " << printable(displayValue(next))
+        context.console.err << "For older entries: veltctl log --before " << printable(displayValue(next))
                             << " (with the same filters), or --all\n";
     }
 }
@@ -82,7 +82,7 @@ void showLog(Context& context, LogOptions options) {
         for (const Json::Value& entry : page["entries"]) {
             entries.append(entry);
         }
-        // A server that names the same page again would be asked for ever.
+        // A server that names the same page again must not be asked forever.
         next = displayValue(page["next"]) == options.before ? Json::Value() : page["next"];
         options.before = displayValue(next);
     } while (options.all && !next.isNull());
@@ -94,14 +94,14 @@ unsigned long eventNumber(const std::string& text) {
     return std::strtoul(text.c_str(), nullptr, 0);
 }
 
-// The entries as they come, one on a line.
+// The entries as they come, one per line.
 class FollowedLog {
 public:
     FollowedLog(Context& context, const LogOptions& options) : context_(context), options_(options) {}
 
-    // The newest entries so far, in the order in which they came.
+    // The newest entries so far, oldest first.
     void begin() {
-        // The connection that follows is in use.
+        // The other connection is busy with the events.
         ApiClient api(context_.api.server());
         const Json::Value page = api.get(logPath(options_));
         for (Json::ArrayIndex i = page["entries"].size(); i > 0; --i) {
@@ -110,8 +110,7 @@ public:
     }
 
     void take(const std::string& event, const std::string& data) {
-        std::string problem;
-        const Json::Value entry = parseJson(data, problem).value_or(Json::Value());
+        const Json::Value entry = parseJson(data).value_or(Json::Value());
         if (event == "log" && entry.isObject() && matches(entry)) {
             write(entry);
         }
@@ -124,7 +123,7 @@ private:
     }
 
     void write(const Json::Value& entry) {
-        // An entry may be on the page and be announced as well.
+        // An entry may be on the page and among the events as well.
         if (entry["id"].asInt64() <= last_) {
             return;
         }
@@ -148,25 +147,13 @@ private:
 
 void followLog(Context& context, const LogOptions& options) {
     FollowedLog log(context, options);
-    EventStream stream([&log](const std::string& event, const std::string& data) { log.take(event, data); });
-    context.console.watchInterruptions();
-    bool begun = false;
-    context.api.follow(
-        "/events",
-        [&](std::string_view piece) {
-            // Only once the stream is there: what is written in between is on the page then.
-            if (!begun) {
-                begun = true;
-                log.begin();
-            }
-            stream.feed(piece);
-            return context.console.out.good();
-        },
-        context.console.interrupted);
-    if (context.console.out.good() && !context.console.interrupted()) {
-        throw Failure(ExitCode::access, "The server ended the stream of events.",
-                      "Check with 'veltctl status' that it runs, then follow the log again.");
-    }
+    // The page is asked for only once the events come, so that it has what was written before them.
+    followEvents(
+        context, [&log] { log.begin(); },
+        [&log](const std::string& event, const std::string& data) {
+            log.take(event, data);
+            return true;
+        });
 }
 
 } // namespace
@@ -174,26 +161,24 @@ void followLog(Context& context, const LogOptions& options) {
 void addLogCommand(CLI::App& app, Command& chosen) {
     auto options = std::make_shared<LogOptions>();
     CLI::App* log = app.add_subcommand("log", "Show the administrator log, the newest entries first");
-    log->add_option("--since", options->since, "Entries since a time, or not older than 30m, 2h, 7d")
+    log->add_option("--since", options->since, "Only entries since a time, or no older than 30m, 2h or 7d")
         ->type_name("TIME");
-    log->add_option("--event", options->event, "Entries of one event, such as 0x11B00012")
+    log->add_option("--event", options->event, "Only entries of this event, such as 0x11B00012")
         ->type_name("EVENT");
-    log->add_option("--actor", options->actor, "Entries of one actor")->type_name("NAME");
+    log->add_option("--actor", options->actor, "Only entries of this user or token")->type_name("NAME");
     CLI::Option* before =
-        log->add_option("--before", options->before, "Entries older than the one with this id")
+        log->add_option("--before", options->before, "Only entries older than the one with this id")
             ->type_name("ID");
     log->add_option("--limit", options->limit, "Entries per page, 1 to 1000 (default 50)")
         ->check(CLI::Range(1, largestPage))
         ->type_name("N");
-    CLI::Option* all = log->add_flag("--all", options->all, "All pages, not only one");
+    CLI::Option* all = log->add_flag("--all", options->all, "Show all pages");
     log->add_flag("-f,--follow", options->follow,
-                  "Show the newest entries last and go on with those to come, until interrupted")
+                  "Show the newest entries last, then new ones as they come, until interrupted")
         ->excludes(before)
         ->excludes(all);
-    log->callback([&chosen, options] {
-        chosen = [options](Context& context) {
-            options->follow ? followLog(context, *options) : showLog(context, *options);
-        };
+    onWords(log, chosen, [options](Context& context) {
+        options->follow ? followLog(context, *options) : showLog(context, *options);
     });
 }
 

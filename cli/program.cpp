@@ -2,6 +2,7 @@
 
 #include "cli/command.h"
 #include "cli/failure.h"
+#include "cli/server_refusal.h"
 
 #include <CLI/CLI.hpp>
 
@@ -14,7 +15,7 @@ namespace {
 
 constexpr const char* exitCodes =
     "Exit codes: 0 done, 1 local file, 2 usage, 3 input refused, 4 conflict, 5 the server failed, "
-    "6 no connection or access.";
+    "6 no connection or no access.";
 
 struct GlobalOptions {
     AddressOptions server;
@@ -54,7 +55,7 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     addCallCommand(app, chosen);
 }
 
-// Which command was meant, for the hint.
+// The command that was meant, as far as the words name one.
 std::string chosenWords(const CLI::App& app) {
     std::string words = "veltctl";
     for (const CLI::App* at = &app; !at->get_subcommands().empty();) {
@@ -71,8 +72,8 @@ ExitCode endOfParsing(const CLI::App& app, const CLI::ParseError& error, Console
     }
     std::string message = error.what();
     message.erase(message.find_last_not_of('\n') + 1);
-    writeFailure(console.err, Failure(ExitCode::usage, message + ".",
-                                      "'" + chosenWords(app) + " --help' explains the words."));
+    writeFailure(console.err,
+                 Failure(ExitCode::usage, message + ".", "See '" + chosenWords(app) + " --help'."));
     return ExitCode::usage;
 }
 
@@ -82,13 +83,12 @@ void runCommand(const Command& command, const GlobalOptions& options, Console& c
     try {
         command(context);
     } catch (const Json::Exception&) {
-        throw Failure(ExitCode::platform, "The server's answer has a form that veltctl does not know.",
-                      "Check that the server is of the same release as veltctl.");
+        throw unexpectedAnswer("The server's answer is not what veltctl expects.");
     }
     console.out.flush();
     if (!console.out) {
-        throw Failure(ExitCode::local, "The output cannot be written.",
-                      "Check where it goes, and the space there.");
+        throw Failure(ExitCode::local, "Cannot write the output.",
+                      "Check where it goes, and that there is space left.");
     }
 }
 

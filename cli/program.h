@@ -1,4 +1,4 @@
-// The whole of veltctl, apart from the process it runs in.
+// All of veltctl except the process it runs in.
 #ifndef VELT_CLI_PROGRAM_H
 #define VELT_CLI_PROGRAM_H
 
@@ -11,11 +11,11 @@
 namespace velt::cli {
 
 /// Runs the command that the words (without the program's name) name. Results go to the console's output,
-/// everything that went wrong to its error output.
+/// errors and warnings to its error output.
 ExitCode runProgram(const std::vector<std::string>& words, Console& console);
 
-/// Every command as its words ("chroot rules add"), and every option of each ("--json"), for tests of what
-/// describes them.
+/// Every command as its words ("chroot rules add"), with its options ("--json"): for tests of the manual page
+/// and the completion.
 struct CommandDescription {
     std::string words;
     std::vector<std::string> options;

@@ -2,6 +2,7 @@
 
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/server_refusal.h"
 
 #include <algorithm>
 
@@ -16,22 +17,12 @@ ChrootRule ruleFromJson(const Json::Value& object) {
     return {textAt(object, "type"), textAt(object, "name"), textAt(object, "path")};
 }
 
-// The server takes any text that is not "user" for a group, and trips over an empty path when it loads the
-// rules again.
-std::string faultOf(const Json::Value& object) {
+std::optional<std::string> faultIn(const Json::Value& object) {
     if (!object.isObject() || !object["type"].isString() || !object["name"].isString() ||
         !object["path"].isString()) {
-        return "an object with the texts type, name and path is expected";
+        return "expected an object with the texts type, name and path";
     }
-    const ChrootRule rule = ruleFromJson(object);
-    if (rule.type != "user" && rule.type != "group") {
-        return "type: expected user or group";
-    }
-    if (rule.name.empty()) {
-        return "name: expected the name of a user or group";
-    }
-    return rule.path.empty() || rule.path.front() != '/' ? "path: expected /home, /SHARE or /SHARE/FOLDER"
-                                                         : "";
+    return faultOf(ruleFromJson(object));
 }
 
 void store(ApiClient& api, const ChrootRules& rules) {
@@ -44,6 +35,20 @@ void store(ApiClient& api, const ChrootRules& rules) {
 
 std::string ruleToText(const ChrootRule& rule) {
     return rule.type + " " + rule.name + " " + rule.path;
+}
+
+// The server takes any type but "user" for a group, and fails to load a rule with an empty path.
+std::optional<std::string> faultOf(const ChrootRule& rule) {
+    if (rule.type != "user" && rule.type != "group") {
+        return "type: expected user or group";
+    }
+    if (rule.name.empty()) {
+        return "name: expected the name of a user or group";
+    }
+    if (rule.path.empty() || rule.path.front() != '/') {
+        return "path: expected /home, /SHARE or /SHARE/FOLDER";
+    }
+    return std::nullopt;
 }
 
 Json::Value rulesToJson(const ChrootRules& rules) {
@@ -61,15 +66,15 @@ Json::Value rulesToJson(const ChrootRules& rules) {
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults) {
     ChrootRules rules;
     if (!array.isArray()) {
-        faults.emplace_back("rules: an array is expected");
+        faults.emplace_back("rules: expected an array");
         return rules;
     }
     for (Json::ArrayIndex i = 0; i < array.size(); ++i) {
-        if (const std::string fault = faultOf(array[i]); !fault.empty()) {
-            faults.push_back("rule " + std::to_string(i + 1) + ": " + fault);
-            continue;
+        if (const auto fault = faultIn(array[i])) {
+            faults.push_back("rule " + std::to_string(i + 1) + ": " + *fault);
+        } else {
+            rules.push_back(ruleFromJson(array[i]));
         }
-        rules.push_back(ruleFromJson(array[i]));
     }
     return rules;
 }
@@ -78,8 +83,7 @@ ChrootRules loadRules(ApiClient& api) {
     const Json::Value answer = api.read(loadMethod);
     ChrootRules rules;
     if (!answer.isObject() || !answer["rules"].isArray()) {
-        throw Failure(ExitCode::platform, "The server's answer holds no chroot rules.",
-                      "Check with 'veltctl status' that the server is of the same release as veltctl.");
+        throw unexpectedAnswer("The server's answer contains no chroot rules.");
     }
     for (const Json::Value& rule : answer["rules"]) {
         rules.push_back(ruleFromJson(rule));
@@ -90,10 +94,9 @@ ChrootRules loadRules(ApiClient& api) {
 void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before) {
     store(api, rules);
     const ChrootRules stored = loadRules(api);
-    Failure dropped(
-        ExitCode::refused,
-        "The server left out rules: it does not know the user or group, or takes no such directory.",
-        "Correct these rules and try again. The rules are as they were before.");
+    Failure dropped(ExitCode::refused,
+                    "The server does not know the user or group of a rule, or does not accept its folder.",
+                    "Correct these rules and try again.");
     for (const ChrootRule& rule : rules) {
         if (std::find(stored.begin(), stored.end(), rule) == stored.end()) {
             dropped.note("left out: " + ruleToText(rule));
@@ -101,6 +104,7 @@ void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& befo
     }
     if (!dropped.notes().empty()) {
         store(api, before);
+        dropped.note("The rules are as they were before.");
         throw Failure(dropped);
     }
 }

@@ -28,8 +28,8 @@ bool isLoopback(const std::string& host) {
 void checkUrl(const std::string& url) {
     const bool known = url.rfind("http://", 0) == 0 || url.rfind("https://", 0) == 0;
     if (!known || hostOf(url).empty()) {
-        throw Failure(ExitCode::usage, "\"" + url + "\" is no address of a server.",
-                      "Give an address such as http://127.0.0.1:8443 or https://server:8443.");
+        throw Failure(ExitCode::usage, "Invalid server address \"" + url + "\".",
+                      "Use an address such as http://127.0.0.1:8443 or https://server:8443.");
     }
 }
 
@@ -48,12 +48,12 @@ std::string readToken(const AddressOptions& options, Console& console) {
 void checkToken(const ServerAddress& server) {
     const std::string& token = server.token;
     if (std::any_of(token.begin(), token.end(), [](unsigned char c) { return c <= 0x20 || c >= 0x7F; })) {
-        throw Failure(ExitCode::usage, "The token holds characters that no token has.",
-                      "Copy the token again; it is one word.");
+        throw Failure(ExitCode::usage, "The token contains characters that are not allowed.",
+                      "Copy the token again; it is a single word.");
     }
     const bool encrypted = server.url.rfind("https://", 0) == 0;
     if (!token.empty() && server.socket.empty() && !encrypted && !isLoopback(hostOf(server.url))) {
-        throw Failure(ExitCode::usage, "The token would travel unencrypted to " + hostOf(server.url) + ".",
+        throw Failure(ExitCode::usage, "The token would be sent unencrypted to " + hostOf(server.url) + ".",
                       "Use an https:// address, or run veltctl on the server itself.");
     }
 }

@@ -1,4 +1,4 @@
-// Where the server is, and with what right it is asked.
+// Where the server is, and how the user proves who they are.
 #ifndef VELT_CLI_SERVER_ADDRESS_H
 #define VELT_CLI_SERVER_ADDRESS_H
 
@@ -11,7 +11,10 @@ namespace velt::cli {
 inline constexpr const char* defaultSocket = "/run/velt/veltd.sock";
 inline constexpr int defaultTimeoutSeconds = 60;
 
-/// What the command line says about the server. Empty texts: not given.
+/// What to do when something else than veltd seems to answer.
+inline constexpr const char* checkAddress = "Check that --url or VELT_URL is the address of veltd.";
+
+/// What the command line says about the server. An empty text was not given.
 struct AddressOptions {
     std::string url;
     std::string socket;
@@ -27,12 +30,12 @@ struct ServerAddress {
     std::string caFile; ///< certificates to trust; empty for the system's
     int timeoutSeconds = defaultTimeoutSeconds;
 
-    /// As people would name it.
+    /// For messages.
     std::string name() const { return socket.empty() ? url : socket; }
 };
 
 /// The options first, then VELT_URL, VELT_SOCKET and VELT_TOKEN, then the default socket. Throws Failure
-/// (usage) for an address that is no http or https URL, and for a token that would travel unencrypted to
+/// (usage) for an address that is not an http or https URL, and for a token that would be sent unencrypted to
 /// another machine.
 ServerAddress findServer(const AddressOptions& options, Console& console);
 

@@ -1,5 +1,9 @@
 #include "cli/server_events.h"
 
+#include "cli/failure.h"
+
+#include <ostream>
+
 namespace velt::cli {
 
 void EventStream::feed(std::string_view piece) {
@@ -38,6 +42,31 @@ void EventStream::takeLine(std::string_view line) {
         data_ += hasData_ ? "\n" : "";
         data_ += value;
         hasData_ = true;
+    }
+}
+
+void followEvents(Context& context, const std::function<void()>& onOpen,
+                  const std::function<bool(const std::string& event, const std::string& data)>& onEvent) {
+    bool open = false;
+    bool done = false;
+    EventStream stream([&](const std::string& event, const std::string& data) {
+        done = done || !onEvent(event, data) || !context.console.out.good();
+    });
+    context.console.watchInterruptions();
+    context.api.follow(
+        "/events",
+        [&](std::string_view piece) {
+            if (!open) {
+                open = true;
+                onOpen();
+            }
+            stream.feed(piece);
+            return !done;
+        },
+        context.console.interrupted);
+    if (!done && !context.console.interrupted()) {
+        throw Failure(ExitCode::access, "The server closed the stream of events.",
+                      "Check with 'veltctl status' that it runs, then try again.");
     }
 }
 

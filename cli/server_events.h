@@ -1,6 +1,8 @@
-// The server-sent events of a stream, put together from pieces of any size.
+// The server's events, as they happen.
 #ifndef VELT_CLI_SERVER_EVENTS_H
 #define VELT_CLI_SERVER_EVENTS_H
+
+#include "cli/command.h"
 
 #include <functional>
 #include <string>
@@ -8,6 +10,7 @@
 
 namespace velt::cli {
 
+/// Server-sent events, put together from pieces of any size.
 class EventStream {
 public:
     using Handler = std::function<void(const std::string& event, const std::string& data)>;
@@ -27,6 +30,11 @@ private:
     std::string data_;
     bool hasData_ = false;
 };
+
+/// Calls `onOpen` as soon as the server sends events, then `onEvent` for each, until that returns false, the
+/// user interrupts or the output cannot be written. Failure (access) when the server ends the stream before.
+void followEvents(Context& context, const std::function<void()>& onOpen,
+                  const std::function<bool(const std::string& event, const std::string& data)>& onEvent);
 
 } // namespace velt::cli
 

@@ -7,9 +7,13 @@
 
 namespace velt::cli {
 
-/// The failure that an answer other than 200, 201 or 204 stands for: the exit code by its status, the
-/// problem's detail, fields, holder, code and request id as notes, and what to do next.
-Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server);
+/// The failure that an answer other than 200, 201 or 204 stands for: the exit code by its status, what the
+/// problem document says, each fact once, and what to do next. `reads`: the request could change nothing.
+Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, bool reads);
+
+/// The failure for an answer that a server of this release would not give; `message` says what is wrong with
+/// it.
+Failure unexpectedAnswer(const std::string& message);
 
 } // namespace velt::cli
 

@@ -2,6 +2,8 @@
 
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/printable.h"
+#include "cli/server_refusal.h"
 #include "cli/text_table.h"
 #include "cli/wanted_services.h"
 
@@ -25,7 +27,7 @@ std::vector<Change> differences(const SettingGroup& group, const Json::Value& be
     return changes;
 }
 
-// Some values are accepted and passed over, such as a UTF-8 switch without UTF-8 support.
+// The server accepts some values without effect, such as a UTF-8 switch without UTF-8 support.
 void warnOfKeptValues(Context& context, const Json::Value& wanted, const Json::Value& after) {
     for (const std::string& key : wanted.getMemberNames()) {
         if (after[key] != wanted[key]) {
@@ -37,14 +39,13 @@ void warnOfKeptValues(Context& context, const Json::Value& wanted, const Json::V
 }
 
 void writeChanges(Context& context, const std::vector<Change>& changes, const Json::Value& after) {
-    if (context.json) {
-        Json::Value result;
-        result["changed"] = Json::Value(Json::arrayValue);
-        for (const Change& change : changes) {
-            result["changed"].append(changeToJson(change));
-        }
-        result["settings"] = after;
-        writeJson(context.console.out, result);
+    Json::Value result;
+    result["changed"] = Json::Value(Json::arrayValue);
+    for (const Change& change : changes) {
+        result["changed"].append(changeToJson(change));
+    }
+    result["settings"] = after;
+    if (context.wroteJson(result)) {
         return;
     }
     for (const Change& change : changes) {
@@ -59,7 +60,7 @@ Json::Value readBack(Context& context, const SettingGroup& group) {
     try {
         return readSettings(context.api, group);
     } catch (Failure& failure) {
-        failure.note("The change itself was accepted; only reading it back failed.");
+        failure.note("The change was accepted; only reading the new settings failed.");
         throw;
     }
 }
@@ -87,7 +88,7 @@ void addGroup(CLI::App& app, Command& chosen, const std::string& title,
     CLI::App* area = app.add_subcommand(group.command, "Read and change " + title);
     area->require_subcommand(1);
     CLI::App* get = area->add_subcommand("get", "Show " + title);
-    CLI::App* set = area->add_subcommand("set", "Change " + title + "; what is not named stays as it is");
+    CLI::App* set = area->add_subcommand("set", "Change " + title + "; what is not named keeps its value");
     // Newer parsers accept no "=" in the name of an argument.
     set->add_option("setting", options->words, "The settings to change")->required()->type_name("key=value");
     set->footer(footerOf(group));
@@ -99,13 +100,10 @@ void addGroup(CLI::App& app, Command& chosen, const std::string& title,
                 ->type_name("N");
         }
     }
-    get->callback([&chosen, options, groupOf] {
-        chosen = [options, groupOf](Context& context) { showSettings(context, groupOf(options->version)); };
-    });
-    set->callback([&chosen, options, groupOf] {
-        chosen = [options, groupOf](Context& context) {
-            changeSettings(context, groupOf(options->version), options->words);
-        };
+    onWords(get, chosen,
+            [options, groupOf](Context& context) { showSettings(context, groupOf(options->version)); });
+    onWords(set, chosen, [options, groupOf](Context& context) {
+        changeSettings(context, groupOf(options->version), options->words);
     });
 }
 
@@ -117,17 +115,15 @@ Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
         return setting.service != nullptr && !hasType(current[setting.key], setting.type);
     };
     if (!current.isObject() || std::any_of(group.settings.begin(), group.settings.end(), missing)) {
-        throw Failure(ExitCode::platform,
-                      std::string("The server's answer holds no ") + group.command + " settings.",
-                      "Check with 'veltctl status' that the server is of the same release as veltctl.");
+        throw unexpectedAnswer(std::string("The server's answer contains no ") + group.command +
+                               " settings.");
     }
     return current;
 }
 
 void showSettings(Context& context, const SettingGroup& group) {
     const Json::Value current = readSettings(context.api, group);
-    if (context.json) {
-        writeJson(context.console.out, current);
+    if (context.wroteJson(current)) {
         return;
     }
     Table table({"SETTING", "VALUE", "MEANING"});

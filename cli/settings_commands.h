@@ -14,14 +14,14 @@ struct Change {
     Json::Value to;
 };
 
-/// The current values: an object. Throws Failure when the answer is none, or lacks a required key.
+/// The current values: an object. Failure when the answer is not an object or lacks a required key.
 Json::Value readSettings(ApiClient& api, const SettingGroup& group);
 
 /// Writes the settings.
 void showSettings(Context& context, const SettingGroup& group);
 
-/// Changes the settings that words of the form key=value name and writes what is different afterwards. A
-/// value that the server accepted but does not show is told on the error output.
+/// Changes the settings that words such as "portnum=2121" name, and writes what is different afterwards. When
+/// the server accepts a value but does not show it, a warning goes to the error output.
 void changeSettings(Context& context, const SettingGroup& group, const std::vector<std::string>& words);
 
 /// As {"key", "from", "to"}.

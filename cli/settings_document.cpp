@@ -1,7 +1,7 @@
 #include "cli/settings_document.h"
 
 #include "cli/failure.h"
-#include "cli/text_table.h"
+#include "cli/printable.h"
 #include "cli/wanted_services.h"
 
 #include <algorithm>

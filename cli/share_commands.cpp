@@ -10,8 +10,7 @@ namespace {
 
 void listShares(Context& context) {
     const Json::Value answer = context.api.read({securityApi, 1, "list_ftp_share"});
-    if (context.json) {
-        writeJson(context.console.out, answer);
+    if (context.wroteJson(answer)) {
         return;
     }
     Table table({"SHARE"});
@@ -24,8 +23,8 @@ void listShares(Context& context) {
 } // namespace
 
 void addShareCommands(CLI::App& app, Command& chosen) {
-    CLI::App* shares = app.add_subcommand("shares", "List the shares that are offered to FTP");
-    shares->callback([&chosen] { chosen = listShares; });
+    CLI::App* shares = app.add_subcommand("shares", "List the shares that FTP offers");
+    onWords(shares, chosen, listShares);
 }
 
 } // namespace velt::cli

@@ -1,6 +1,7 @@
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/printable.h"
 #include "cli/server_events.h"
 #include "cli/text_table.h"
 #include "cli/time_text.h"
@@ -16,16 +17,16 @@ namespace velt::cli {
 
 namespace {
 
-// A service that is to run and does not is what an administrator looks for.
+// What an administrator looks for is a service that should run and does not.
 std::string stateOf(const Json::Value& service) {
     if (!service.isObject() || service["running"] != false) {
         return textAt(service, "enabled");
     }
-    const bool shallRun = service["wanted"] == true || service["enabled"] == true;
-    return shallRun ? "down" : textAt(service, "enabled");
+    const bool shouldRun = service["wanted"] == true || service["enabled"] == true;
+    return shouldRun ? "down" : textAt(service, "enabled");
 }
 
-/// Why services do not follow their settings; those of one daemon have one reason.
+/// Why services are not in the state that their settings say. Services of one daemon share a reason.
 void writeReasons(Context& context, const Json::Value& services) {
     std::string last;
     for (const Json::Value& service : services) {
@@ -41,8 +42,7 @@ void writeReasons(Context& context, const Json::Value& services) {
 
 void showStatus(Context& context) {
     const Json::Value status = context.api.get("/api/status");
-    if (context.json) {
-        writeJson(context.console.out, status);
+    if (context.wroteJson(status)) {
         return;
     }
     context.console.out << "veltd " << printable(textAt(status, "version")) << ", up for "
@@ -76,8 +76,7 @@ std::string describeEvent(const std::string& event, const Json::Value& data) {
 }
 
 void writeEvent(Context& context, const std::string& event, const std::string& text) {
-    std::string problem;
-    const Json::Value data = parseJson(text, problem).value_or(Json::Value(text));
+    const Json::Value data = parseJson(text).value_or(Json::Value(text));
     if (context.json) {
         Json::Value line;
         line["event"] = event;
@@ -90,53 +89,40 @@ void writeEvent(Context& context, const std::string& event, const std::string& t
     context.console.out.flush();
 }
 
-void followEvents(Context& context, const EventOptions& options) {
+void showEvents(Context& context, const EventOptions& options) {
     int seen = 0;
-    const auto enough = [&] { return options.count > 0 && seen >= options.count; };
-    const auto wanted = [&](const std::string& event) {
-        return options.kinds.empty() ||
-               std::find(options.kinds.begin(), options.kinds.end(), event) != options.kinds.end();
-    };
-    EventStream stream([&](const std::string& event, const std::string& data) {
-        if (!enough() && wanted(event)) {
-            writeEvent(context, event, data);
-            ++seen;
-        }
-    });
-    context.console.watchInterruptions();
-    context.api.follow(
-        "/events",
-        [&](std::string_view piece) {
-            stream.feed(piece);
-            return !enough() && context.console.out.good();
-        },
-        context.console.interrupted);
-    if (!enough() && context.console.out.good() && !context.console.interrupted()) {
-        throw Failure(ExitCode::access, "The server ended the stream of events.",
-                      "Check with 'veltctl status' that it runs, then follow the events again.");
-    }
+    followEvents(
+        context, [] {},
+        [&](const std::string& event, const std::string& data) {
+            const auto& kinds = options.kinds;
+            if (kinds.empty() || std::find(kinds.begin(), kinds.end(), event) != kinds.end()) {
+                writeEvent(context, event, data);
+                ++seen;
+            }
+            return options.count == 0 || seen < options.count;
+        });
 }
 
 } // namespace
 
 void addStatusCommands(CLI::App& app, Command& chosen) {
     CLI::App* status = app.add_subcommand("status", "Show which services run, and on which ports");
-    status->callback([&chosen] { chosen = showStatus; });
+    onWords(status, chosen, showStatus);
 
     auto options = std::make_shared<EventOptions>();
-    CLI::App* events = app.add_subcommand("events", "Follow what happens on the server, until interrupted");
-    events->add_option("--count", options->count, "End after so many events")
+    CLI::App* events =
+        app.add_subcommand("events", "Show what happens on the server as it happens, until interrupted");
+    events->add_option("--count", options->count, "Stop after this many events")
         ->check(CLI::PositiveNumber)
         ->type_name("N");
     events
         ->add_option("--kind", options->kinds,
-                     "Only events of this kind, or these, separated by commas: service, log, request")
+                     "Only events of these kinds, separated by commas: service, log, request")
         ->check(CLI::IsMember({"service", "log", "request"}))
         ->delimiter(',')
         ->allow_extra_args(false)
         ->type_name("KIND");
-    events->callback(
-        [&chosen, options] { chosen = [options](Context& context) { followEvents(context, *options); }; });
+    onWords(events, chosen, [options](Context& context) { showEvents(context, *options); });
 }
 
 } // namespace velt::cli

@@ -1,6 +1,7 @@
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/printable.h"
 #include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
@@ -20,8 +21,7 @@ struct TokenOptions {
 
 void listTokens(Context& context) {
     const Json::Value answer = context.api.get("/api/tokens");
-    if (context.json) {
-        writeJson(context.console.out, answer);
+    if (context.wroteJson(answer)) {
         return;
     }
     Table table({"ID", "NAME", "ROLE", "CREATED"});
@@ -37,23 +37,21 @@ void createToken(Context& context, const TokenOptions& options) {
     body["name"] = options.name;
     body["role"] = options.role;
     const Json::Value token = context.api.post("/api/tokens", body);
-    if (context.json) {
-        writeJson(context.console.out, token);
+    if (context.wroteJson(token)) {
         return;
     }
-    // The token alone goes to the output, so that it can be put into a file or a variable.
+    // Only the token goes to the output, so that it can be put into a file or a variable.
     context.console.err << "Token " << printable(textAt(token, "id")) << " for "
                         << printable(textAt(token, "name")) << " (" << printable(textAt(token, "role"))
-                        << "). It is shown only now; keep it safe:\n";
+                        << "). It is shown only this once; keep it safe:\n";
     context.console.out << printable(textAt(token, "token")) << '\n';
 }
 
 void deleteToken(Context& context, const TokenOptions& options) {
     context.api.remove("/api/tokens/" + percentEncode(options.id));
-    if (context.json) {
-        Json::Value result;
-        result["deleted"] = options.id;
-        writeJson(context.console.out, result);
+    Json::Value result;
+    result["deleted"] = options.id;
+    if (context.wroteJson(result)) {
         return;
     }
     context.console.out << "Token " << printable(options.id) << " is no longer valid.\n";
@@ -67,20 +65,18 @@ void addTokenCommands(CLI::App& app, Command& chosen) {
     tokens->require_subcommand(1);
 
     CLI::App* list = tokens->add_subcommand("list", "List the tokens");
-    list->callback([&chosen] { chosen = listTokens; });
+    onWords(list, chosen, listTokens);
 
-    CLI::App* create = tokens->add_subcommand("create", "Make a token and show it, once");
+    CLI::App* create = tokens->add_subcommand("create", "Create a token and show it once");
     create->add_option("name", options->name, "What the token is for")->required()->type_name("");
     create->add_option("--role", options->role, "viewer may only read (default), admin may change everything")
         ->check(CLI::IsMember({"admin", "viewer"}))
         ->type_name("admin|viewer");
-    create->callback(
-        [&chosen, options] { chosen = [options](Context& context) { createToken(context, *options); }; });
+    onWords(create, chosen, [options](Context& context) { createToken(context, *options); });
 
-    CLI::App* remove = tokens->add_subcommand("delete", "Make a token invalid");
+    CLI::App* remove = tokens->add_subcommand("delete", "Delete a token, so that it is no longer valid");
     remove->add_option("id", options->id, "The id that 'tokens list' shows")->required()->type_name("");
-    remove->callback(
-        [&chosen, options] { chosen = [options](Context& context) { deleteToken(context, *options); }; });
+    onWords(remove, chosen, [options](Context& context) { deleteToken(context, *options); });
 }
 
 } // namespace velt::cli

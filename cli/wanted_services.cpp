@@ -6,7 +6,7 @@ namespace velt::cli {
 
 namespace {
 
-// Null from a server that has no such answer: the methods are what counts.
+// Null when the server does not tell: a change must not fail for that.
 Json::Value servicesOf(ApiClient& api) {
     try {
         const Json::Value status = api.get("/api/status");
@@ -47,11 +47,11 @@ StoredSwitches readStoredSwitches(ApiClient& api, const SettingGroup& group, con
         if (stored.isBool()) {
             switches.values[setting.key] = stored;
         } else if (current[setting.key] == false) {
-            switches.doubts.push_back(std::string(setting.key) +
-                                      " was sent as off, as the server shows it. If the service is switched "
-                                      "on and only down, it is "
-                                      "switched off now: name " +
-                                      setting.key + "=on to have it run.");
+            const std::string key = setting.key;
+            switches.doubts.push_back(key +
+                                      " was sent as off, because the server shows it so. If the service was "
+                                      "only down, it is switched off now: set " +
+                                      key + "=on to have it run.");
         }
     }
     return switches;

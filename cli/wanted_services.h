@@ -11,12 +11,12 @@ namespace velt::cli {
 
 struct StoredSwitches {
     Json::Value values;              ///< the current values, with the switches as they are stored
-    std::vector<std::string> doubts; ///< a sentence for each switch of which that is not known
+    std::vector<std::string> doubts; ///< a sentence for each switch whose stored state is not known
 };
 
-/// A switch that is read as off may belong to a service that is just down, and sending "off" with a change of
-/// something else would switch it off for good. So the stored switches are asked for, unless `wanted` names
-/// them all. A server that does not tell leaves a doubt for each switch that is read as off.
+/// A switch that reads as off may belong to a service that is only down, and sending "off" along with another
+/// change would switch it off for good. So this asks for the stored switches, unless `wanted` names them all.
+/// When the server does not tell, each switch that reads as off is in doubt.
 StoredSwitches readStoredSwitches(ApiClient& api, const SettingGroup& group, const Json::Value& wanted,
                                   const Json::Value& current);
 

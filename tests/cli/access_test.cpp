@@ -66,18 +66,18 @@ TEST_F(AccessTest, AnAbsentServerSaysHowToStartIt) {
     environment = {{"VELT_SOCKET", folder.path("absent.sock")}};
     const RunResult result = run({"status"});
     EXPECT_EQ(result.code, 6);
-    EXPECT_EQ(
-        result.err,
-        "veltctl: No answer from " + folder.path("absent.sock") +
-            ".\n  No such file or directory\nWhat to do: Start veltd, or name its socket with --socket or "
-            "VELT_SOCKET, or its address with --url or VELT_URL.\n");
+    EXPECT_EQ(result.err, "veltctl: Cannot connect to " + folder.path("absent.sock") +
+                              ": No such file or directory.\nWhat to do: Start veltd, or say where it "
+                              "listens: at a Unix socket "
+                              "(--socket or VELT_SOCKET) or an address (--url or VELT_URL).\n");
 }
 
 TEST_F(AccessTest, ARefusedConnectionNamesTheAddress) {
     environment = {{"VELT_URL", "http://127.0.0.1:1"}};
     const RunResult result = run({"status"});
     EXPECT_EQ(result.code, 6);
-    EXPECT_NE(result.err.find("No answer from http://127.0.0.1:1."), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("Cannot connect to http://127.0.0.1:1: Connection refused."), std::string::npos)
+        << result.err;
     EXPECT_NE(result.err.find("--url"), std::string::npos) << result.err;
 }
 

@@ -57,16 +57,16 @@ TEST_F(ChrootTest, UsersAreConfinedAndReleased) {
 }
 
 TEST_F(ChrootTest, RulesAreShown) {
-    EXPECT_EQ(run({"chroot", "rules", "load"}).out, "TYPE   NAME   DIRECTORY  EXISTS\n"
-                                                    "user   anna   /docs      yes\n"
-                                                    "group  staff  /gone      no\n");
+    EXPECT_EQ(run({"chroot", "rules", "load"}).out, "TYPE   NAME   FOLDER  EXISTS\n"
+                                                    "user   anna   /docs   yes\n"
+                                                    "group  staff  /gone   no\n");
     EXPECT_EQ(jsonOf(run({"chroot", "rules", "load", "--json"}).out)["total"], 2);
 }
 
 TEST_F(ChrootTest, ARuleIsAddedToTheOthers) {
     const RunResult result = run({"chroot", "rules", "add", "user", "ben", "/home"});
     EXPECT_EQ(result.code, 0) << result.err;
-    EXPECT_EQ(result.out, "TYPE   NAME   DIRECTORY\n"
+    EXPECT_EQ(result.out, "TYPE   NAME   FOLDER\n"
                           "user   anna   /docs\n"
                           "group  staff  /gone\n"
                           "user   ben    /home\n");
@@ -97,13 +97,16 @@ TEST_F(ChrootTest, ARuleOfAnUnknownUserIsTold) {
 TEST_F(ChrootTest, ARuleThatTheServerWouldMisreadIsNotSent) {
     EXPECT_EQ(run({"chroot", "rules", "add", "User", "anna", "/docs"}).code, 2);
     EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", ""}).code, 2);
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", "docs"}).err,
+              "veltctl: Invalid rule: path: expected /home, /SHARE or /SHARE/FOLDER.\n"
+              "What to do: Write it as in 'veltctl chroot rules add user NAME /SHARE'.\n");
     EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", "docs"}).code, 2);
     EXPECT_EQ(run({"chroot", "rules", "add", "user", "", "/docs"}).code, 2);
     EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna"}).code, 2);
     EXPECT_TRUE(asked().empty());
 }
 
-TEST_F(ChrootTest, RulesAreRemovedByNameOrByDirectory) {
+TEST_F(ChrootTest, RulesAreRemovedByNameOrByFolder) {
     EXPECT_EQ(run({"chroot", "rules", "remove", "user", "anna", "/other"}).code, 3);
     EXPECT_EQ(run({"chroot", "rules", "remove", "group", "anna"}).code, 3);
     EXPECT_TRUE(sent(rulesSave).empty());
@@ -126,7 +129,7 @@ TEST_F(ChrootTest, AnInvalidSetOfRulesIsNotSent) {
                                                   {"type": "user", "name": "a", "path": ""}])");
     EXPECT_EQ(result.code, 3);
     EXPECT_NE(result.err.find("rule 1: type: expected user or group"), std::string::npos) << result.err;
-    EXPECT_NE(result.err.find("rule 2: an object"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("rule 2: expected an object"), std::string::npos) << result.err;
     EXPECT_NE(result.err.find("rule 3: path: expected"), std::string::npos) << result.err;
     // Without an array the server would remove every rule.
     EXPECT_EQ(run({"chroot", "rules", "save", "-"}, "{}").code, 3);

@@ -174,7 +174,11 @@ TEST_F(DocumentTest, EveryFaultOfADocumentIsNamedAndNothingIsAsked) {
     }
     EXPECT_TRUE(asked().empty());
     EXPECT_EQ(run({"import", "-"}, "[]").code, 3);
-    EXPECT_EQ(run({"import", "-"}, "{").code, 3);
+    const RunResult unfinished = run({"import", "-"}, "{");
+    EXPECT_EQ(unfinished.code, 3);
+    EXPECT_EQ(unfinished.err,
+              "veltctl: Invalid JSON in standard input: line 1, column 2: Missing '}' or object "
+              "member name.\n  Nothing was changed.\nWhat to do: Correct it and try again.\n");
     EXPECT_EQ(run({"import", folder.path("absent")}).code, 2);
     EXPECT_EQ(run({"import", folder.path(".")}).code, 2);
 }
@@ -191,7 +195,7 @@ TEST_F(DocumentTest, AFailureMidwaySaysWhatWasAppliedAndWhatNot) {
     EXPECT_EQ(result.code, 4);
     EXPECT_EQ(result.out, "security  anonymous: off -> on\n");
     for (const char* line :
-         {"held by web (pid 4)", "in the section ftp", "security: was applied", "sftp: was not applied"}) {
+         {"held by web (pid 4)", "ftp: failed", "security: applied", "sftp: not applied"}) {
         EXPECT_NE(result.err.find(line), std::string::npos) << line << "\n" << result.err;
     }
     EXPECT_EQ(host.sftp["portnum"], 22);

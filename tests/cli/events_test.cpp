@@ -133,7 +133,7 @@ TEST_F(EventsTest, AStreamThatTheServerEndsIsNoSuccess) {
     const RunResult result = run({"events"});
     EXPECT_EQ(result.code, 6);
     EXPECT_NE(result.out.find("ftpd: start"), std::string::npos);
-    EXPECT_NE(result.err.find("ended the stream"), std::string::npos);
+    EXPECT_NE(result.err.find("closed the stream"), std::string::npos);
 }
 
 TEST_F(EventsTest, ARefusalIsNoStream) {

@@ -32,7 +32,9 @@ TEST_F(ExitCodesTest, Done) {
 
 TEST_F(ExitCodesTest, LocalFile) {
     EXPECT_EQ(codeOf({"export", "-o", folder.path("absent/file")}), 1);
-    EXPECT_NE(last.err.find("cannot be written"), std::string::npos);
+    EXPECT_NE(last.err.find("Cannot write " + folder.path("absent/file") + ": No such file"),
+              std::string::npos)
+        << last.err;
 }
 
 TEST_F(ExitCodesTest, Usage) {
@@ -70,6 +72,22 @@ TEST_F(ExitCodesTest, ThePlatformFailed) {
     EXPECT_EQ(last.err.find("may be in effect"), std::string::npos) << last.err;
 }
 
+TEST_F(ExitCodesTest, AFailedReadChangesNothing) {
+    const std::string sftpGet = "GET /api/VELT.Core.FileServ.FTP.SFTP/v1/get";
+    for (const char* problem :
+         {R"({"title": "Internal Server Error"})", R"({"title": "Failed", "code": 1902})"}) {
+        host.answerWith(sftpGet, problemReply(500, problem));
+        EXPECT_EQ(codeOf({"sftp", "get"}), 5);
+        EXPECT_EQ(last.err.find("in effect"), std::string::npos) << last.err;
+        EXPECT_NE(last.err.find("What to do: "), std::string::npos) << last.err;
+    }
+    // Some methods only read, and yet are called with POST.
+    const std::string list = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/list";
+    host.answerWith(list, problemReply(500, R"({"title": "Failed", "code": 1902})"));
+    EXPECT_EQ(codeOf({"chroot", "users", "list"}), 5);
+    EXPECT_EQ(last.err.find("in effect"), std::string::npos) << last.err;
+}
+
 TEST_F(ExitCodesTest, NoConnectionOrAccess) {
     EXPECT_EQ(codeAfter(401), 6);
     EXPECT_EQ(codeAfter(403), 6);
@@ -83,7 +101,7 @@ TEST_F(ExitCodesTest, AFullOutputIsNoSuccess) {
     const RunResult result = runProcess({"/bin/sh", "-c", "exec \"$0\" sftp get >/dev/full", VELTCTL},
                                         {"VELT_SOCKET=" + server.socketPath()});
     EXPECT_EQ(result.code, 1);
-    EXPECT_NE(result.err.find("cannot be written"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("Cannot write the output"), std::string::npos) << result.err;
 }
 
 TEST_F(ExitCodesTest, AShareThatCannotBeReachedIsAConflictOfItsOwn) {

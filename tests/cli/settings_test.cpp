@@ -56,7 +56,7 @@ TEST_F(SettingsTest, WhereASwitchIsNotKnownItIsToldWhatWasSent) {
     EXPECT_EQ(result.code, 0);
     EXPECT_EQ(result.out, "portnum: 22 -> 2222\n");
     EXPECT_NE(result.err.find("warning: enable was sent as off"), std::string::npos) << result.err;
-    EXPECT_NE(result.err.find("name enable=on"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("set enable=on"), std::string::npos) << result.err;
     EXPECT_EQ(run({"sftp", "set", "portnum=2223", "enable=off"}).err, "") << "the user said so";
     host.answerWith("GET /api/status", problemReply(404, "{}"));
     EXPECT_NE(run({"ftp", "set", "timeout=5"}).err.find("enable_ftps was sent as off"), std::string::npos);
@@ -101,6 +101,9 @@ TEST_F(SettingsTest, ChangesWithoutEndInBetweenAreAConflict) {
     host.outdated = 1000;
     const RunResult result = run({"ftp", "set", "timeout=5"});
     EXPECT_EQ(result.code, 4);
+    EXPECT_EQ(result.err, "veltctl: Others keep changing the settings at the same time.\n"
+                          "  Nothing was changed.\n"
+                          "What to do: Try again later.\n");
     EXPECT_EQ(host.ftp["timeout"], 300);
 }
 
@@ -212,12 +215,51 @@ TEST_F(SettingsTest, ARefusedChangeNamesTheField) {
     const RunResult result = run({"ftp", "set", "utf8_mode=9"});
     EXPECT_EQ(result.code, 3);
     EXPECT_EQ(result.out, "");
-    EXPECT_EQ(result.err, "veltctl: The server refused the input (HTTP 422, code 1901).\n"
-                          "  A parameter is not valid\n"
+    EXPECT_EQ(result.err, "veltctl: A parameter is not valid (HTTP 422, code 1901).\n"
                           "  Wrong UTF-8 webapi parameter\n"
                           "  utf8_mode: expected 0, 1 or 2\n"
                           "  request id r-7\n"
-                          "What to do: Correct the input and try again. Nothing was changed.\n");
+                          "What to do: Correct the input and try again.\n");
+}
+
+TEST_F(SettingsTest, EachFactOfARefusalIsSaidOnce) {
+    host.answerWith(ftpSet,
+                    problemReply(422, R"({"title": "A parameter is not valid", "status": 422, "code": 1901,
+        "detail": "utf8_mode: expected 0, 1 or 2. Nothing was changed.", "changed": false,
+        "errors": [{"field": "utf8_mode", "expected": "0, 1 or 2"}]})"));
+    EXPECT_EQ(run({"ftp", "set", "utf8_mode=9"}).err,
+              "veltctl: A parameter is not valid (HTTP 422, code 1901).\n"
+              "  utf8_mode: expected 0, 1 or 2. Nothing was changed.\n"
+              "What to do: Correct the input and try again.\n");
+    host.answerWith(ftpSet, problemReply(409, R"({"title": "The FTP port is taken", "code": 1903,
+        "detail": "Port 2222 is held by the SFTP service.", "holder": "the SFTP service", "changed": false})"));
+    EXPECT_EQ(run({"ftp", "set", "portnum=2222"}).err,
+              "veltctl: The FTP port is taken (HTTP 409, code 1903).\n"
+              "  Port 2222 is held by the SFTP service.\n"
+              "  Nothing was changed.\n"
+              "What to do: Choose another port, or free this one.\n");
+    host.answerWith(ftpSet, problemReply(409, R"({"title": "The FTP port is taken", "code": 1903,
+        "holder": "the SFTP service"})"));
+    EXPECT_EQ(run({"ftp", "set", "portnum=2222"}).err,
+              "veltctl: The FTP port is taken (HTTP 409, code 1903).\n"
+              "  held by the SFTP service\n"
+              "What to do: Choose another port, or free this one.\n");
+}
+
+TEST_F(SettingsTest, WhatTheServerSaysIsSafeToShow) {
+    host.answerWith(ftpSet, problemReply(409, R"({"title": "Taken\u001b[2J", "code": 1903,
+        "detail": "first\nsecond\u001b]0;x\u0007", "holder": "\u009b31m", "request_id": "r\u007f",
+        "errors": [{"field": "\u001bc", "expected": "\r"}]})"));
+    EXPECT_EQ(run({"ftp", "set", "portnum=2222"}).err,
+              "veltctl: Taken\\x1b[2J (HTTP 409, code 1903).\n"
+              "  first\n"
+              "  second\\x1b]0;x\\x07\n"
+              "  \\x1bc: expected \\x0d\n"
+              "  held by \\x9b31m\n"
+              "  request id r\\x7f\n"
+              "What to do: Choose another port, or free this one.\n");
+    host.sftp["note"] = "\x1b\x7f\xC2\x9B";
+    EXPECT_NE(run({"sftp", "get", "--json"}).out.find(R"("\u001b\u007f\u009b")"), std::string::npos);
 }
 
 TEST_F(SettingsTest, SharesAreListed) {

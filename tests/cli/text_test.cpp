@@ -1,5 +1,6 @@
 #include "cli/http_client.h"
 #include "cli/json_io.h"
+#include "cli/printable.h"
 #include "cli/text_table.h"
 #include "cli/time_text.h"
 
@@ -16,6 +17,15 @@ TEST(TextTest, ControlCharactersCannotReachATerminal) {
                         "31m"),
               "\\x9b31m");
     EXPECT_EQ(printable("\xC2\xA0"), "\xC2\xA0");
+}
+
+TEST(TextTest, ControlCharactersAreEscapedInJson) {
+    const std::string text = "a\x1b\x7f\xC2\x9B\xC2\xA0";
+    EXPECT_EQ(compactJson(text), "\"a\\u001b\\u007f\\u009b\xC2\xA0\"");
+    EXPECT_EQ(parseJson(compactJson(text)), Json::Value(text));
+    std::ostringstream out;
+    writeJson(out, text);
+    EXPECT_EQ(out.str(), compactJson(text) + "\n");
 }
 
 TEST(TextTest, ColumnsAreAlignedByCharacters) {
@@ -61,12 +71,15 @@ TEST(TextTest, ValuesAreShownForPeople) {
 }
 
 TEST(TextTest, JsonIsReadStrictly) {
-    std::string problem;
-    EXPECT_TRUE(parseJson("5", problem));
+    EXPECT_TRUE(parseJson("5"));
     for (const char* text :
          {"", "{} x", "{'a': 1}", "{\"a\": 1, \"a\": 2}", "{\"a\": 1,}", "// c\n{}", "NaN"}) {
-        problem.clear();
-        EXPECT_FALSE(parseJson(text, problem)) << text;
-        EXPECT_NE(problem, "") << text;
+        std::string reason;
+        EXPECT_FALSE(parseJson(text, &reason)) << text;
+        EXPECT_EQ(reason.rfind("line ", 0), 0U) << reason;
+        EXPECT_EQ(reason.find('\n'), std::string::npos) << reason;
     }
+    std::string reason;
+    EXPECT_FALSE(parseJson("{\n  \"a\" 1}", &reason));
+    EXPECT_EQ(reason, "line 2, column 7: Missing ':' after object member name");
 }

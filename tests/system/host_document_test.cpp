@@ -69,8 +69,8 @@ TEST_F(HostDocument, aRefusedSectionIsNamedWithThoseThatWereApplied) {
     document["sftp"]["portnum"] = 2233;
     const ProcessResult result = veltctl({"import", "-"}, textOf(document));
     EXPECT_EQ(result.exitCode, 5);
-    for (const char* text : {"The FTP time-out is -5 seconds", "in the section ftp", "security: was applied",
-                             "sftp: was not applied"}) {
+    for (const char* text :
+         {"The FTP time-out is -5 seconds", "ftp: failed", "security: applied", "sftp: not applied"}) {
         EXPECT_TRUE(contains(result.errors, text)) << result.errors;
     }
     const Json::Value now = jsonOf(exported());

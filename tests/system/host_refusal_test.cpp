@@ -213,7 +213,7 @@ TEST_F(HostRefusal, noConnectionAndNoAccess) {
     EXPECT_EQ(veltctlWith(viewer, {"ftp", "get"}).exitCode, 0);
     const ProcessResult refused = veltctlWith(viewer, {"ftp", "set", "timeout=5"});
     EXPECT_EQ(refused.exitCode, 6);
-    EXPECT_TRUE(contains(refused.errors, "this one may only read")) << refused.errors;
+    EXPECT_TRUE(contains(refused.errors, "this one can only read")) << refused.errors;
     EXPECT_EQ(veltctlWith(viewer, {"tokens", "list"}).exitCode, 6);
     EXPECT_EQ(jsonOf(exported())["ftp"]["timeout"], 300);
 }
