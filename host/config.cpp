@@ -172,18 +172,19 @@ void readFile(Config& config, const std::string& file) {
         throw ConfigError("The configuration file " + file +
                           " cannot be read: " + std::generic_category().message(errno) + ".");
     }
-    const ParsedObject parsed = parseObject(*content);
-    if (!parsed.error.empty()) {
-        throw ConfigError("The configuration file " + file + " is no JSON object: " + parsed.error + ".");
+    const auto settings = parseObject(*content);
+    if (!settings) {
+        throw ConfigError("The configuration file " + file +
+                          " is not a JSON object: " + settings.error().message + ".");
     }
-    for (const std::string& name : parsed.value.getMemberNames()) {
+    for (const std::string& name : settings->getMemberNames()) {
         std::string place = "The configuration file " + file;
         place.append(": \"").append(name).append("\"");
         const Setting* const setting = settingNamed(name);
         if (setting == nullptr) {
             throw ConfigError(place + " is no setting. --help lists them.");
         }
-        const Json::Value& value = parsed.value[name];
+        const Json::Value& value = (*settings)[name];
         try {
             for (const std::string& each : valuesOf(value, setting->form)) {
                 setting->set(config, each);

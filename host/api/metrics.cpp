@@ -1,6 +1,6 @@
 #include "host/api/metrics.h"
 
-#include "host/api/services.h"
+#include "host/api/service_status.h"
 
 #include <prometheus/counter.h>
 #include <prometheus/gauge.h>

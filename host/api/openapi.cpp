@@ -70,11 +70,11 @@ struct OpenApi::Schemas {
 };
 
 OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>()) {
-    ParsedObject parsed = parseObject(text_);
-    if (!parsed.error.empty()) {
-        throw std::runtime_error("The description of the API is damaged: " + parsed.error);
+    auto document = parseObject(text_);
+    if (!document) {
+        throw std::runtime_error("The description of the API is damaged: " + document.error().message + ".");
     }
-    document_ = std::move(parsed.value);
+    document_ = std::move(*document);
     const Json::Value& paths = document_["paths"];
     for (const std::string& path : paths.getMemberNames()) {
         const Json::Value& source =

@@ -24,6 +24,10 @@ HttpResponse problemWith(int status, Json::Value members, const std::string& req
     return response;
 }
 
+HttpResponse notAnObject(const Error& reason, const std::string& extent, const std::string& requestId) {
+    return problem(400, "The body is not a JSON object: " + reason.message + "." + extent, requestId);
+}
+
 HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
                           const std::string& requestId) {
     Json::Value members(Json::objectValue);

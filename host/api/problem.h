@@ -2,6 +2,7 @@
 #ifndef VELT_HOST_API_PROBLEM_H
 #define VELT_HOST_API_PROBLEM_H
 
+#include "base/result.h"
 #include "host/http/message.h"
 
 #include <json/value.h>
@@ -21,6 +22,9 @@ HttpResponse problem(int status, const std::string& detail, const std::string& r
 
 /// A problem with the members given; those of RFC 9457 are filled in when they are missing.
 HttpResponse problemWith(int status, Json::Value members, const std::string& requestId);
+
+/// A body that is not a JSON object, for the reason given; `extent` says what became of the request.
+HttpResponse notAnObject(const Error& reason, const std::string& extent, const std::string& requestId);
 
 /// A problem with one field of what was sent; `extent` says what became of the request.
 HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,

@@ -1,7 +1,7 @@
 #include "host/api/row_answer.h"
 
 #include "host/api/problem.h"
-#include "host/api/services.h"
+#include "host/api/service_status.h"
 #include "host/module/module_log.h"
 
 #include <algorithm>

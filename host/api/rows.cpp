@@ -2,7 +2,7 @@
 
 #include "host/api/problem.h"
 #include "host/api/row_answer.h"
-#include "host/api/services.h"
+#include "host/api/service_status.h"
 #include "host/base/json.h"
 
 #include <array>
@@ -58,16 +58,15 @@ HttpResponse Rows::list() const {
 }
 
 HttpResponse Rows::call(const Row& row, const Call& call) {
-    const ParsedObject parsed = parseObject(call.request.body);
-    if (!parsed.error.empty()) {
-        return problem(400, "The body is not a JSON object: " + parsed.error + ". Nothing was changed.",
-                       call.id);
+    const auto parameters = parseObject(call.request.body);
+    if (!parameters) {
+        return notAnObject(parameters.error(), " Nothing was changed.", call.id);
     }
     // Writes run one at a time, so nothing comes between this look and the change.
     if (!row.reads() && !revision_.allows(call.request.ifMatch)) {
         return problem(412, "The settings have changed since they were read. Nothing was changed.", call.id);
     }
-    return callAndAnswer(row, parsed.value, call);
+    return callAndAnswer(row, *parameters, call);
 }
 
 HttpResponse Rows::callAndAnswer(const Row& row, const Json::Value& parameters, const Call& call) {

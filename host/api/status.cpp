@@ -1,7 +1,7 @@
 #include "host/api/status.h"
 
 #include "host/api/problem.h"
-#include "host/api/services.h"
+#include "host/api/service_status.h"
 
 #include <chrono>
 

@@ -30,16 +30,16 @@ HttpResponse list(const TokenStore& store) {
 }
 
 HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
-    const ParsedObject parsed = parseObject(call.request.body);
-    if (!parsed.error.empty()) {
-        return problem(400, "The body is not a JSON object: " + parsed.error + "." + noneMade, call.id);
+    const auto body = parseObject(call.request.body);
+    if (!body) {
+        return notAnObject(body.error(), noneMade, call.id);
     }
-    const Json::Value& name = parsed.value["name"];
+    const Json::Value& name = (*body)["name"];
     if (!isName(name)) {
         return fieldProblem(422, {"name", "a text of 1 to 64 bytes without control characters"}, noneMade,
                             call.id);
     }
-    const Json::Value& word = parsed.value["role"];
+    const Json::Value& word = (*body)["role"];
     const auto role = word.isString() ? roleNamed(word.asString()) : std::nullopt;
     if (!role) {
         return fieldProblem(422, {"role", "\"admin\" or \"viewer\""}, noneMade, call.id);

@@ -1,10 +1,11 @@
 #include "host/base/json.h"
 
+#include "base/utf8.h"
+
 #include <json/reader.h>
 #include <json/writer.h>
 
 #include <algorithm>
-#include <cstdint>
 #include <memory>
 #include <sstream>
 
@@ -13,6 +14,7 @@ namespace velt::host {
 namespace {
 
 constexpr int maxNesting = 64;
+constexpr const char* blanks = " \t\r\n";
 
 std::unique_ptr<Json::CharReader> makeReader() {
     Json::CharReaderBuilder builder;
@@ -51,44 +53,21 @@ std::string firstError(const std::string& errors) {
     return where + ": " + what;
 }
 
-/// The length of the well-formed UTF-8 sequence at the text's start, or 0.
-std::size_t sequenceLength(std::string_view text) {
-    const auto first = static_cast<std::uint8_t>(text[0]);
-    if (first < 0x80) {
-        return 1;
-    }
-    const std::size_t length = first >= 0xF0 ? 4 : (first >= 0xE0 ? 3 : 2);
-    if (first < 0xC2 || first > 0xF4 || text.size() < length) {
-        return 0;
-    }
-    for (std::size_t i = 1; i < length; ++i) {
-        if ((static_cast<std::uint8_t>(text[i]) & 0xC0U) != 0x80U) {
-            return 0;
-        }
-    }
-    const auto second = static_cast<std::uint8_t>(text[1]);
-    const bool overlong = (first == 0xE0 && second < 0xA0) || (first == 0xF0 && second < 0x90);
-    const bool outside = (first == 0xED && second > 0x9F) || (first == 0xF4 && second > 0x8F);
-    return overlong || outside ? 0 : length;
-}
-
-ParsedObject parseText(std::string_view text) {
+Result<Json::Value> parseText(std::string_view text) {
     thread_local const std::unique_ptr<Json::CharReader> reader = makeReader();
-    ParsedObject parsed;
     std::string errors;
     Json::Value value;
     if (!reader->parse(text.data(), text.data() + text.size(), &value, &errors)) {
-        parsed.error = firstError(errors);
-    } else if (!value.isObject()) {
-        parsed.error = positionOf(text, text.find_first_not_of(" \t\r\n")) +
-                       ": expected a JSON object, such as {\"key\": true}";
-    } else {
-        parsed.value = std::move(value);
+        return Error(firstError(errors));
     }
-    return parsed;
+    if (!value.isObject()) {
+        return Error(positionOf(text, text.find_first_not_of(blanks)) +
+                     ": expected a JSON object, such as {\"key\": true}");
+    }
+    return value;
 }
 
-/// Bytes that are no UTF-8 stand inside of strings, where any character may stand for them.
+/// Bytes that are not UTF-8 are inside strings, where any character may take their place.
 std::string repaired(const std::string& text) {
     constexpr std::string_view replacement = "\xEF\xBF\xBD";
     std::string good;
@@ -103,33 +82,19 @@ std::string repaired(const std::string& text) {
 
 } // namespace
 
-std::size_t findInvalidUtf8(std::string_view text) {
-    for (std::size_t i = 0; i < text.size();) {
-        const std::size_t length = sequenceLength(text.substr(i));
-        if (length == 0) {
-            return i;
-        }
-        i += length;
+Result<Json::Value> parseObject(std::string_view text) {
+    if (text.find_first_not_of(blanks) == std::string_view::npos) {
+        return Json::Value(Json::objectValue);
     }
-    return std::string_view::npos;
-}
-
-ParsedObject parseObject(std::string_view text) {
-    if (text.find_first_not_of(" \t\r\n") == std::string_view::npos) {
-        return {};
-    }
-    ParsedObject parsed;
     if (const std::size_t invalid = findInvalidUtf8(text); invalid != std::string_view::npos) {
-        parsed.error = positionOf(text, invalid) + ": the text is not UTF-8";
-        return parsed;
+        return Error(positionOf(text, invalid) + ": the text is not UTF-8");
     }
     // The library throws when the nesting is too deep.
     try {
         return parseText(text);
     } catch (const std::exception&) {
-        parsed.error =
-            "line 1, column 1: the values are nested more than " + std::to_string(maxNesting) + " deep";
-        return parsed;
+        return Error("line 1, column 1: the values are nested more than " + std::to_string(maxNesting) +
+                     " deep");
     }
 }
 

@@ -3,6 +3,8 @@
 #ifndef VELT_HOST_BASE_JSON_H
 #define VELT_HOST_BASE_JSON_H
 
+#include "base/result.h"
+
 #include <json/value.h>
 
 #include <string>
@@ -10,20 +12,13 @@
 
 namespace velt::host {
 
-struct ParsedObject {
-    Json::Value value{Json::objectValue};
-    std::string error; ///< "" when the text is one JSON object; else what is wrong and where
-};
+/// Reads one JSON object: UTF-8, no comments, no duplicate keys. Text of blanks alone is the empty object.
+/// An error says what is wrong and where: "line 1, column 8: the text is not UTF-8".
+Result<Json::Value> parseObject(std::string_view text);
 
-/// Reads one JSON object: UTF-8, no comments, no key twice. Text of blanks alone is the empty object.
-ParsedObject parseObject(std::string_view text);
-
-/// Compact JSON in one line, UTF-8 as it is. A byte that is no UTF-8, such as one of a file's name, becomes
+/// Compact JSON in one line, UTF-8 as it is. A byte that is not UTF-8, such as one of a file's name, becomes
 /// the replacement character.
 std::string toJson(const Json::Value& value);
-
-/// The offset of the first byte that is no UTF-8, or npos.
-std::size_t findInvalidUtf8(std::string_view text);
 
 } // namespace velt::host
 

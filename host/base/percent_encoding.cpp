@@ -1,6 +1,6 @@
 #include "host/base/percent_encoding.h"
 
-#include "host/base/json.h"
+#include "base/utf8.h"
 
 #include <algorithm>
 #include <charconv>

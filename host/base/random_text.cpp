@@ -7,21 +7,11 @@
 #include <cerrno>
 #include <cstdint>
 #include <cstdio>
+#include <string_view>
 #include <system_error>
 #include <vector>
 
 namespace velt::host {
-
-std::string hexadecimal(const unsigned char* bytes, std::size_t count) {
-    constexpr char digits[] = "0123456789abcdef";
-    std::string text;
-    text.reserve(2 * count);
-    for (std::size_t i = 0; i < count; ++i) {
-        text += digits[bytes[i] >> 4U];
-        text += digits[bytes[i] & 0xFU];
-    }
-    return text;
-}
 
 std::string randomHexadecimal(std::size_t bytes) {
     std::vector<unsigned char> buffer(bytes);
@@ -33,7 +23,13 @@ std::string randomHexadecimal(std::size_t bytes) {
         }
         filled += count > 0 ? static_cast<std::size_t>(count) : 0;
     }
-    return hexadecimal(buffer.data(), bytes);
+    constexpr std::string_view digits = "0123456789abcdef";
+    std::string text;
+    for (const unsigned char byte : buffer) {
+        text += digits[byte >> 4U];
+        text += digits[byte & 0xFU];
+    }
+    return text;
 }
 
 std::string nextRequestId() {

@@ -7,9 +7,6 @@
 
 namespace velt::host {
 
-/// Two lower-case digits for each byte.
-std::string hexadecimal(const unsigned char* bytes, std::size_t count);
-
 /// That many bytes from the kernel's generator, in hexadecimal. Throws std::system_error when it gives none.
 std::string randomHexadecimal(std::size_t bytes);
 

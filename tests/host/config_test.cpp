@@ -219,10 +219,10 @@ TEST(Config, AKeyThatIsWrongIsNamed) {
     EXPECT_EQ(refusal({"--config", "/nowhere"}),
               "The configuration file /nowhere cannot be read: No such file or directory.");
     EXPECT_EQ(refusal({"--config", "/tmp"}), "The configuration file /tmp cannot be read: Is a directory.");
-    EXPECT_TRUE(refusalOfFile("listen = x").starts_with(" is no JSON object: line 1, column 1"));
-    EXPECT_TRUE(refusalOfFile("[]").starts_with(" is no JSON object: line 1, column 1"));
+    EXPECT_TRUE(refusalOfFile("listen = x").starts_with(" is not a JSON object: line 1, column 1"));
+    EXPECT_TRUE(refusalOfFile("[]").starts_with(" is not a JSON object: line 1, column 1"));
     EXPECT_TRUE(
-        refusalOfFile("{\n \"workers\": 1,\n \"workers\": 2}").starts_with(" is no JSON object: line 3"));
+        refusalOfFile("{\n \"workers\": 1,\n \"workers\": 2}").starts_with(" is not a JSON object: line 3"));
     for (const char* key : {"nonsense", "config", "help", "version", "--listen", "max_body"}) {
         const std::string name = "\"" + std::string(key) + "\"";
         EXPECT_EQ(refusalOfFile("{" + name + ": \"x\"}"), ": " + name + " is no setting. --help lists them.");

@@ -76,7 +76,7 @@ protected:
         for (const char* text :
              {"null", "true", "false", "0", "1", "2", "3", "-1", "65535", "65536", "2147483648", "1.5",
               "\"\"", "\"x\"", "\"50000:50010\"", "[]", "[\"bob\"]", "[1]", "{}"}) {
-            all.push_back(velt::host::parseObject(R"({"v":)" + std::string(text) + "}").value["v"]);
+            all.push_back((*velt::host::parseObject(R"({"v":)" + std::string(text) + "}"))["v"]);
         }
         return all;
     }
@@ -181,9 +181,9 @@ TEST_F(OpenApiTest, TheDescriptionAgreesWithTheModuleOnEveryParameter) {
         const Json::Value& properties = body["application/json"]["schema"]["properties"];
         Json::Value base(Json::objectValue);
         if (row->method == "set" && row->api == ftp) {
-            base = velt::host::parseObject(required.at("set")).value;
+            base = *velt::host::parseObject(required.at("set"));
         } else if (row->method == "list") {
-            base = velt::host::parseObject(required.at("list")).value;
+            base = *velt::host::parseObject(required.at("list"));
         } else if (row->api == ftp + ".SFTP" && row->method == "set") {
             base["enable"] = true;
         }

@@ -1,6 +1,6 @@
 // Requests that reach the module, over the fake platform.
 
-#include "host/base/json.h"
+#include "base/utf8.h"
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -236,7 +236,7 @@ TEST_F(HostRows, PathsAreDecodedSegmentBySegment) {
 TEST_F(HostRows, AnAnswerIsUtf8WhateverTheRequestIs) {
     const Answer path = get("/caf\xE9");
     EXPECT_EQ(path.status, 400);
-    EXPECT_EQ(velt::host::findInvalidUtf8(path.body), std::string::npos) << path.body;
+    EXPECT_EQ(velt::findInvalidUtf8(path.body), std::string::npos) << path.body;
     Client client = connect();
     const Answer host = client.ask("GET /healthz HTTP/1.1\r\nHost: caf\xE9\r\n" + admin + "\r\n");
     EXPECT_EQ(host.status, 403);

@@ -1,4 +1,4 @@
-#include "host/api/services.h"
+#include "host/api/service_status.h"
 
 #include "ftp/ftp_library.h"
 #include "host/module/module_call.h"

@@ -1,6 +1,6 @@
 // The services that the modules administer: which are switched on, and which run.
-#ifndef VELT_HOST_API_SERVICES_H
-#define VELT_HOST_API_SERVICES_H
+#ifndef VELT_HOST_API_SERVICE_STATUS_H
+#define VELT_HOST_API_SERVICE_STATUS_H
 
 #include "host/http/message.h"
 #include "host/module/module_table.h"

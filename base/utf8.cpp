@@ -1,0 +1,66 @@
+#include "base/utf8.h"
+
+#include <array>
+
+namespace velt {
+
+namespace {
+
+struct Form {
+    unsigned mask;
+    unsigned lead;
+    std::size_t length;
+    char32_t least; ///< smaller characters have a shorter form and must not use this one
+};
+constexpr std::array<Form, 4> forms{{
+    {0x80, 0x00, 1, 0},
+    {0xE0, 0xC0, 2, 0x80},
+    {0xF0, 0xE0, 3, 0x800},
+    {0xF8, 0xF0, 4, 0x10000},
+}};
+
+unsigned byteAt(std::string_view text, std::size_t index) {
+    return static_cast<unsigned char>(text[index]);
+}
+
+bool isCharacter(char32_t code) {
+    return code <= 0x10FFFF && (code < 0xD800 || code > 0xDFFF);
+}
+
+Utf8Character decode(std::string_view text, const Form& form) {
+    if (text.size() < form.length) {
+        return {};
+    }
+    char32_t code = byteAt(text, 0) & ~form.mask;
+    for (std::size_t i = 1; i < form.length; ++i) {
+        if ((byteAt(text, i) & 0xC0) != 0x80) {
+            return {};
+        }
+        code = (code << 6) | (byteAt(text, i) & 0x3F);
+    }
+    return code >= form.least && isCharacter(code) ? Utf8Character{form.length, code} : Utf8Character{};
+}
+
+} // namespace
+
+Utf8Character firstUtf8Character(std::string_view text) {
+    for (const Form& form : forms) {
+        if ((byteAt(text, 0) & form.mask) == form.lead) {
+            return decode(text, form);
+        }
+    }
+    return {};
+}
+
+std::size_t findInvalidUtf8(std::string_view text) {
+    for (std::size_t i = 0; i < text.size();) {
+        const std::size_t length = firstUtf8Character(text.substr(i)).length;
+        if (length == 0) {
+            return i;
+        }
+        i += length;
+    }
+    return std::string_view::npos;
+}
+
+} // namespace velt
