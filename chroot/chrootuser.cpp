@@ -3,7 +3,7 @@
 #include "ftp/ftp_library.h"
 #include "handler/log.h"
 #include "handler/owners.h"
-#include "handler/parameters.h"
+#include "handler/parameter_types.h"
 #include "platform/adminlog.h"
 
 #include <strings.h>

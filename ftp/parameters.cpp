@@ -1,6 +1,6 @@
 #include "ftp/parameters.h"
 
-#include "handler/parameters.h"
+#include "handler/parameter_types.h"
 
 #include <cstdio>
 

@@ -2,7 +2,7 @@
 
 #include "handler/log.h"
 #include "handler/owners.h"
-#include "handler/parameters.h"
+#include "handler/parameter_types.h"
 #include "platform/adminlog.h"
 #include "platform/service.h"
 #include "platform/share.h"

@@ -1,6 +1,6 @@
 // The types that a request's parameters must have.
-#ifndef VELT_HANDLER_PARAMETERS_H
-#define VELT_HANDLER_PARAMETERS_H
+#ifndef VELT_HANDLER_PARAMETER_TYPES_H
+#define VELT_HANDLER_PARAMETER_TYPES_H
 
 #include <json/value.h>
 

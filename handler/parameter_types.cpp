@@ -1,4 +1,4 @@
-#include "handler/parameters.h"
+#include "handler/parameter_types.h"
 
 #include <algorithm>
 
