@@ -60,7 +60,7 @@ void addCallCommand(CLI::App& app, Command& chosen) {
     call->add_flag("--list", options->list, "List the methods of the server");
     call->add_option("api", options->method.api, "Name of the API")->type_name("");
     call->add_option("version", options->method.version, "Version of the API")
-        ->check(CLI::PositiveNumber)
+        ->check(CLI::Range(1, 99))
         ->type_name("");
     call->add_option("method", options->method.method, "Name of the method")->type_name("");
     call->add_option("parameters", options->parameters, "A JSON object, or - for the standard input")

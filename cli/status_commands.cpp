@@ -113,7 +113,7 @@ void addStatusCommands(CLI::App& app, Command& chosen) {
     CLI::App* events =
         app.add_subcommand("events", "Show what happens on the server as it happens, until interrupted");
     events->add_option("--count", options->count, "Stop after this many events")
-        ->check(CLI::PositiveNumber)
+        ->check(CLI::Range(1, 1000000))
         ->type_name("N");
     events
         ->add_option("--kind", options->kinds,
