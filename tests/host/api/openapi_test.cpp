@@ -59,7 +59,8 @@ protected:
         if (schema.isObject() && schema.isMember("$ref")) {
             std::string path = schema["$ref"].asString().substr(1);
             std::replace(path.begin(), path.end(), '/', '.');
-            const Json::Value& target = Json::Path(path).resolve(document);
+            const Json::Path place(path);
+            const Json::Value& target = place.resolve(document);
             EXPECT_TRUE(target.isObject()) << path;
             return resolved(target);
         }
