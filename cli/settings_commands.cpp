@@ -1,11 +1,10 @@
-#include "cli/settings_commands.h"
-
+#include "cli/command.h"
+#include "cli/current_settings.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
 #include "cli/printable.h"
-#include "cli/server_refusal.h"
+#include "cli/setting_change.h"
 #include "cli/text_table.h"
-#include "cli/wanted_services.h"
 
 #include <CLI/CLI.hpp>
 
@@ -16,9 +15,9 @@ namespace velt::cli {
 
 namespace {
 
-std::vector<Change> differences(const SettingGroup& group, const Json::Value& before,
-                                const Json::Value& after) {
-    std::vector<Change> changes;
+std::vector<SettingChange> differences(const SettingGroup& group, const Json::Value& before,
+                                       const Json::Value& after) {
+    std::vector<SettingChange> changes;
     for (const Setting& setting : group.settings) {
         if (before[setting.key] != after[setting.key]) {
             changes.push_back({setting.key, before[setting.key], after[setting.key]});
@@ -38,17 +37,17 @@ void warnOfKeptValues(Context& context, const Json::Value& wanted, const Json::V
     }
 }
 
-void writeChanges(Context& context, const std::vector<Change>& changes, const Json::Value& after) {
+void writeChanges(Context& context, const std::vector<SettingChange>& changes, const Json::Value& after) {
     Json::Value result;
     result["changed"] = Json::Value(Json::arrayValue);
-    for (const Change& change : changes) {
+    for (const SettingChange& change : changes) {
         result["changed"].append(changeToJson(change));
     }
     result["settings"] = after;
     if (context.wroteJson(result)) {
         return;
     }
-    for (const Change& change : changes) {
+    for (const SettingChange& change : changes) {
         context.console.out << changeToText(change) << '\n';
     }
     if (changes.empty()) {
@@ -63,6 +62,35 @@ Json::Value readBack(Context& context, const SettingGroup& group) {
         failure.note("The change was accepted; only reading the new settings failed.");
         throw;
     }
+}
+
+void showSettings(Context& context, const SettingGroup& group) {
+    const Json::Value current = readSettings(context.api, group);
+    if (context.wroteJson(current)) {
+        return;
+    }
+    Table table({"SETTING", "VALUE", "MEANING"});
+    for (const Setting& setting : group.settings) {
+        if (current.isMember(setting.key)) {
+            table.add({setting.key, displayValue(current[setting.key]), setting.meaning});
+        }
+    }
+    table.write(context.console.out);
+}
+
+void changeSettings(Context& context, const SettingGroup& group, const std::vector<std::string>& words) {
+    const Json::Value wanted = parseAssignments(group, words);
+    CurrentSettings before;
+    context.api.changeWhatWasRead([&] {
+        before = readCurrentSettings(context.api, group, wanted);
+        context.api.call(group.method("set"), completeChange(group, wanted, before.stored));
+    });
+    const Json::Value after = readBack(context, group);
+    writeChanges(context, differences(group, before.shown, after), after);
+    for (const std::string& doubt : before.doubts) {
+        context.console.err << "veltctl: warning: " << printable(doubt) << '\n';
+    }
+    warnOfKeptValues(context, wanted, after);
 }
 
 struct SettingsOptions {
@@ -108,66 +136,6 @@ void addGroup(CLI::App& app, Command& chosen, const std::string& title,
 }
 
 } // namespace
-
-Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
-    Json::Value current = api.read(group.method("get"));
-    const auto missing = [&](const Setting& setting) {
-        return setting.service != nullptr && !hasType(current[setting.key], setting.type);
-    };
-    if (!current.isObject() || std::any_of(group.settings.begin(), group.settings.end(), missing)) {
-        throw unexpectedAnswer(std::string("The server's answer contains no ") + group.command +
-                               " settings.");
-    }
-    return current;
-}
-
-void showSettings(Context& context, const SettingGroup& group) {
-    const Json::Value current = readSettings(context.api, group);
-    if (context.wroteJson(current)) {
-        return;
-    }
-    Table table({"SETTING", "VALUE", "MEANING"});
-    for (const Setting& setting : group.settings) {
-        if (current.isMember(setting.key)) {
-            table.add({setting.key, displayValue(current[setting.key]), setting.meaning});
-        }
-    }
-    table.write(context.console.out);
-}
-
-void changeSettings(Context& context, const SettingGroup& group, const std::vector<std::string>& words) {
-    const Json::Value wanted = parseAssignments(group, words);
-    Json::Value before;
-    std::vector<std::string> doubts;
-    context.api.changeWhatWasRead([&] {
-        before = readSettings(context.api, group);
-        const StoredSwitches switches = readStoredSwitches(context.api, group, wanted, before);
-        doubts = switches.doubts;
-        context.api.call(group.method("set"), completeChange(group, wanted, switches.values));
-    });
-    const Json::Value after = readBack(context, group);
-    writeChanges(context, differences(group, before, after), after);
-    for (const std::string& doubt : doubts) {
-        context.console.err << "veltctl: warning: " << printable(doubt) << '\n';
-    }
-    warnOfKeptValues(context, wanted, after);
-}
-
-Json::Value changeToJson(const Change& change) {
-    Json::Value result;
-    result["key"] = change.key;
-    result["from"] = change.from;
-    result["to"] = change.to;
-    return result;
-}
-
-std::string changeToText(const Change& change) {
-    const auto shown = [](const Json::Value& value) {
-        const std::string text = displayValue(value);
-        return text.empty() ? std::string("(empty)") : printable(text);
-    };
-    return change.key + ": " + shown(change.from) + " -> " + shown(change.to);
-}
 
 void addSettingsCommands(CLI::App& app, Command& chosen) {
     addGroup(app, chosen, "the FTP and FTPS settings", ftpSettings);

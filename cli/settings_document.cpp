@@ -1,8 +1,8 @@
 #include "cli/settings_document.h"
 
-#include "cli/failure.h"
+#include "cli/current_settings.h"
 #include "cli/printable.h"
-#include "cli/wanted_services.h"
+#include "cli/setting_change.h"
 
 #include <algorithm>
 #include <charconv>
@@ -129,16 +129,13 @@ std::vector<Json::Value> requestsFor(const Json::Value& wanted, const Json::Valu
 
 void change(ApiClient& api, const SettingGroup& group, const Json::Value& wanted) {
     api.changeWhatWasRead([&] {
-        const Json::Value current = readSettings(api, group);
         api.call(group.method("set"),
-                 completeChange(group, wanted, readStoredSwitches(api, group, wanted, current).values));
+                 completeChange(group, wanted, readCurrentSettings(api, group, wanted).stored));
     });
 }
 
 void planGroup(ApiClient& api, const SettingGroup& group, const Json::Value& section, ImportPlan& plan) {
-    const StoredSwitches switches =
-        readStoredSwitches(api, group, Json::Value(Json::objectValue), readSettings(api, group));
-    const Json::Value& current = switches.values;
+    const Json::Value current = readCurrentSettings(api, group).stored;
     const Json::Value wanted = wantedOf(group, section, current);
     ImportStep step;
     step.section = group.command;
@@ -146,7 +143,7 @@ void planGroup(ApiClient& api, const SettingGroup& group, const Json::Value& sec
         if (!wanted.isMember(setting.key) || wanted[setting.key] == current[setting.key]) {
             continue;
         }
-        const Change change{setting.key, current[setting.key], wanted[setting.key]};
+        const SettingChange change{setting.key, current[setting.key], wanted[setting.key]};
         step.changes.push_back(changeToText(change));
         step.changesJson.append(changeToJson(change));
     }
@@ -199,9 +196,7 @@ Json::Value exportSettings(ApiClient& api) {
     document["format_version"] = formatVersion;
     document[rulesSection] = rulesToJson(loadRules(api));
     for (const SettingGroup& group : groupsInOrder()) {
-        const Json::Value current = readSettings(api, group);
-        document[group.command] = knownSettings(
-            group, readStoredSwitches(api, group, Json::Value(Json::objectValue), current).values);
+        document[group.command] = knownSettings(group, readCurrentSettings(api, group).stored);
     }
     return document;
 }

@@ -3,7 +3,6 @@
 #define VELT_CLI_SETTINGS_DOCUMENT_H
 
 #include "cli/rule_list.h"
-#include "cli/settings_commands.h"
 
 namespace velt::cli {
 

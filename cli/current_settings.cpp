@@ -1,0 +1,77 @@
+#include "cli/current_settings.h"
+
+#include "cli/failure.h"
+#include "cli/server_refusal.h"
+
+#include <algorithm>
+
+namespace velt::cli {
+
+namespace {
+
+// Null when the server does not tell: a change must not fail for that.
+Json::Value servicesOf(ApiClient& api) {
+    try {
+        const Json::Value status = api.get("/api/status");
+        return status.isObject() ? status["services"] : Json::Value();
+    } catch (const Failure&) {
+        return {};
+    }
+}
+
+Json::Value storedSwitch(const Json::Value& services, const std::string& service) {
+    if (!services.isArray()) {
+        return {};
+    }
+    for (const Json::Value& each : services) {
+        if (each.isObject() && each["name"] == service && each["wanted"].isBool()) {
+            return each["wanted"];
+        }
+    }
+    return {};
+}
+
+void lookUpSwitch(const Json::Value& services, const Setting& setting, CurrentSettings& current) {
+    const std::string key = setting.key;
+    const Json::Value stored = storedSwitch(services, setting.service);
+    if (stored.isBool()) {
+        current.stored[key] = stored;
+    } else if (current.shown[key] == false) {
+        current.doubts.push_back(key +
+                                 " was sent as off, because the server shows it so. If the service was only "
+                                 "down, it is switched off now: set " +
+                                 key + "=on to have it run.");
+    }
+}
+
+} // namespace
+
+Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
+    Json::Value shown = api.read(group.method("get"));
+    const auto missing = [&](const Setting& setting) {
+        return setting.service != nullptr && !hasType(shown[setting.key], setting.type);
+    };
+    if (!shown.isObject() || std::any_of(group.settings.begin(), group.settings.end(), missing)) {
+        throw unexpectedAnswer(std::string("The server's answer contains no ") + group.command +
+                               " settings.");
+    }
+    return shown;
+}
+
+CurrentSettings readCurrentSettings(ApiClient& api, const SettingGroup& group, const Json::Value& wanted) {
+    CurrentSettings current;
+    current.shown = readSettings(api, group);
+    current.stored = current.shown;
+    std::vector<Setting> switches;
+    std::copy_if(group.settings.begin(), group.settings.end(), std::back_inserter(switches),
+                 [&](const Setting& each) { return each.service != nullptr && !wanted.isMember(each.key); });
+    if (!switches.empty()) {
+        const Json::Value services = servicesOf(api);
+        for (const Setting& each : switches) {
+            lookUpSwitch(services, each, current);
+        }
+    }
+    return current;
+}
+
+} // namespace velt::cli
