@@ -59,16 +59,6 @@ int onProgress(void* context, curl_off_t, curl_off_t, curl_off_t, curl_off_t) no
     return transfer.stopped ? 1 : 0;
 }
 
-void initialiseLibrary() {
-    struct Library {
-        Library() { curl_global_init(CURL_GLOBAL_DEFAULT); }
-        ~Library() { curl_global_cleanup(); }
-        Library(const Library&) = delete;
-        Library& operator=(const Library&) = delete;
-    };
-    static const Library library;
-}
-
 std::string hintFor(const ServerAddress& server, CURLcode code, long systemError) {
     if (code == CURLE_OPERATION_TIMEDOUT) {
         return "The request may still take effect: check 'veltctl status', or wait longer with --timeout.";
@@ -124,9 +114,8 @@ struct HttpClient::Handle {
     }
 };
 
-HttpClient::HttpClient(ServerAddress server) : server_(std::move(server)) {
-    initialiseLibrary();
-    handle_ = std::make_unique<Handle>();
+HttpClient::HttpClient(ServerAddress server)
+    : server_(std::move(server)), handle_(std::make_unique<Handle>()) {
     if (handle_->curl == nullptr) {
         throw std::bad_alloc();
     }
@@ -218,18 +207,9 @@ HttpAnswer HttpClient::follow(const std::string& path, const std::function<bool(
 }
 
 std::string percentEncode(const std::string& text) {
-    static const char* const digits = "0123456789ABCDEF";
-    static const std::string plain = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
-    std::string result;
-    for (const char c : text) {
-        const auto byte = static_cast<unsigned char>(c);
-        if (plain.find(c) != std::string::npos) {
-            result += c;
-        } else {
-            result += {'%', digits[byte >> 4U], digits[byte & 0x0FU]};
-        }
-    }
-    return result;
+    const std::unique_ptr<char, decltype(&curl_free)> encoded(
+        curl_easy_escape(nullptr, text.c_str(), static_cast<int>(text.size())), &curl_free);
+    return encoded == nullptr ? throw std::bad_alloc() : std::string(encoded.get());
 }
 
 } // namespace velt::cli

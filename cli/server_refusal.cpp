@@ -2,52 +2,41 @@
 
 #include "cli/json_io.h"
 
+#include <algorithm>
+#include <iterator>
+
 namespace velt::cli {
 
 namespace {
 
 constexpr int codeShareUnreachable = 1905;
 
-ExitCode exitCodeOf(long status) {
-    switch (status) {
-    case 401:
-    case 403:
-    case 408:
-    case 429:
-        return ExitCode::access;
-    case 409:
-        return ExitCode::conflict;
-    default:
-        break;
-    }
-    if (status >= 500) {
-        return ExitCode::platform;
-    }
-    return status >= 400 ? ExitCode::refused : ExitCode::access;
-}
+struct Meaning {
+    long status;
+    ExitCode code;
+    const char* message;
+};
 
-std::string messageOf(long status) {
-    switch (status) {
-    case 401:
-        return "The server requires authentication";
-    case 403:
-        return "The server does not allow this";
-    case 404:
-        return "The server cannot find this";
-    case 405:
-        return "The server does not support this method";
-    case 408:
-    case 429:
-        return "The server is busy";
-    case 409:
-        return "The request conflicts with something else on the server";
-    default:
-        break;
+constexpr Meaning meanings[] = {
+    {401, ExitCode::access, "The server requires authentication"},
+    {403, ExitCode::access, "The server does not allow this"},
+    {404, ExitCode::refused, "The server cannot find this"},
+    {405, ExitCode::refused, "The server does not support this method"},
+    {408, ExitCode::access, "The server is busy"},
+    {409, ExitCode::conflict, "The request conflicts with something else on the server"},
+    {429, ExitCode::access, "The server is busy"},
+};
+constexpr Meaning otherFailure{500, ExitCode::platform, "The server failed to carry out the request"};
+constexpr Meaning otherRefusal{400, ExitCode::refused, "The server refused the input"};
+constexpr Meaning noAnswerOfOurs{0, ExitCode::access, "The answer is not from veltd"};
+
+const Meaning& meaningOf(long status) {
+    const auto* const found = std::find_if(std::begin(meanings), std::end(meanings),
+                                           [status](const Meaning& each) { return each.status == status; });
+    if (found != std::end(meanings)) {
+        return *found;
     }
-    if (status >= 500) {
-        return "The server failed to carry out the request";
-    }
-    return status >= 400 ? "The server refused the input" : "The answer is not from veltd";
+    return status >= 500 ? otherFailure : status >= 400 ? otherRefusal : noAnswerOfOurs;
 }
 
 std::string accessHint(long status, const ServerAddress& server) {
@@ -102,21 +91,27 @@ std::string hintOf(long status, const Json::Value& problem, const ServerAddress&
     return status >= 400 ? "Correct the input and try again." : checkAddress;
 }
 
-// The server's detail may have the fact in a sentence already.
-void addMissing(Failure& failure, const std::string& detail, const std::string& fact,
-                const std::string& note) {
-    if (!fact.empty() && detail.find(fact) == std::string::npos) {
-        failure.note(note);
-    }
-}
-
-void addFields(Failure& failure, const std::string& detail, const Json::Value& errors) {
-    if (!errors.isArray()) {
-        return;
-    }
-    for (const Json::Value& error : errors) {
+// Adds what the server's detail does not say already.
+void addNotes(Failure& failure, const Json::Value& problem) {
+    const std::string detail = textAt(problem, "detail");
+    const auto add = [&](const std::string& fact, const std::string& note) {
+        if (!fact.empty() && detail.find(fact) == std::string::npos) {
+            failure.note(note);
+        }
+    };
+    const Json::Value noErrors;
+    const Json::Value& errors = problem["errors"];
+    for (const Json::Value& error : errors.isArray() ? errors : noErrors) {
         const std::string fact = textAt(error, "field") + ": expected " + textAt(error, "expected");
-        addMissing(failure, detail, fact, fact);
+        add(fact, fact);
+    }
+    const std::string holder = textAt(problem, "holder");
+    add(holder, "held by " + holder);
+    if (problem["changed"] == false) {
+        add("Nothing was changed.", "Nothing was changed.");
+    }
+    if (const std::string id = textAt(problem, "request_id"); !id.empty()) {
+        failure.note("request id " + id);
     }
 }
 
@@ -132,25 +127,17 @@ Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, bool 
     const std::string detail = textAt(problem, "detail");
     // The title of any other problem is the name of its status.
     const bool titleTells = !title.empty() && (!code.empty() || problem.isMember("changed"));
-    Failure failure(exitCodeOf(answer.status),
-                    (titleTells ? title : messageOf(answer.status)) + " (HTTP " +
-                        std::to_string(answer.status) + (code.empty() ? "" : ", code " + code) + ").",
+    const Meaning& meaning = meaningOf(answer.status);
+    Failure failure(meaning.code,
+                    (titleTells ? title : meaning.message) + " (HTTP " + std::to_string(answer.status) +
+                        (code.empty() ? "" : ", code " + code) + ").",
                     hintOf(answer.status, problem, server, reads));
     if (!detail.empty()) {
         failure.note(detail);
     } else if (!titleTells && !title.empty()) {
         failure.note(title);
     }
-    addFields(failure, detail, problem["errors"]);
-    const std::string holder = textAt(problem, "holder");
-    addMissing(failure, detail, holder, "held by " + holder);
-    if (problem["changed"] == false) {
-        const std::string nothing = "Nothing was changed.";
-        addMissing(failure, detail, nothing, nothing);
-    }
-    if (const std::string id = textAt(problem, "request_id"); !id.empty()) {
-        failure.note("request id " + id);
-    }
+    addNotes(failure, problem);
     return failure;
 }
 
