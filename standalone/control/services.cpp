@@ -41,6 +41,14 @@ int startEnabledServices() {
     });
 }
 
+int stopServices() {
+    return atBoundary([] {
+        const int ftpResult = startOrStop(Daemon::ftp, false);
+        const int sftpResult = startOrStop(Daemon::sftp, false);
+        return ftpResult < 0 ? ftpResult : sftpResult;
+    });
+}
+
 ServiceState serviceState(const std::string& service) {
     const auto daemon = daemonOf(service.c_str());
     return daemon ? daemonState(*daemon) : ServiceState{};

@@ -14,6 +14,10 @@ namespace velt {
 /// result is then negative.
 int startEnabledServices();
 
+/// Ends the daemons and their sessions. The settings stay as they are stored, so that startEnabledServices
+/// starts the same ones again.
+int stopServices();
+
 /// How often the daemon behind the service ("ftpd", "sftp") was started again after it had ended by itself,
 /// since its supervisor, or the machine, began. 0 for one that is off, and for an unknown name.
 std::uint64_t daemonRestarts(const std::string& service);

@@ -253,6 +253,19 @@ TEST_F(ServicesTest, AfterABootOneThatFailsDoesNotHinderTheOther) {
     EXPECT_TRUE(accepts(sftpPort_));
 }
 
+TEST_F(ServicesTest, AllAreStoppedAndStartAgainAsTheyWere) {
+    storeFtp(tls);
+    storeSftp(true);
+    ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(stopServices(), 0) << lastErrorSentence();
+    EXPECT_FALSE(accepts(ftpPort_));
+    EXPECT_FALSE(accepts(sftpPort_));
+    EXPECT_EQ(stopServices(), 0) << "nothing runs";
+    ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+    EXPECT_TRUE(accepts(ftpPort_));
+    EXPECT_TRUE(accepts(sftpPort_));
+}
+
 TEST_F(ServicesTest, EveryOperationIsAnEffectThatCanBeListedInstead) {
     std::vector<std::string> listed;
     setEffectHook([&listed](Effect effect, std::string_view subject) {
