@@ -127,7 +127,7 @@ int VLIBCINFOSetKeyValue(const char* key, const char* value) {
     return velt::atBoundary([&] {
         // A blank stands for no address: whoever may not write an empty text can still take the address away.
         if (key == velt::externalAddressKey)
-            return velt::changeExternalAddress(velt::isBlank(value) ? "" : value);
+            return velt::toContract(velt::changeExternalAddress(velt::isBlank(value) ? "" : value));
         return velt::writeSystemInformation(key, value);
     });
 }

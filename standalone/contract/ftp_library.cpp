@@ -11,9 +11,11 @@ namespace velt {
 namespace {
 
 template<class Value> int readSetting(Value FtpSettings::*setting) {
-    return atBoundary([&] {
-        const auto settings = loadFtpFile();
-        return settings ? static_cast<int>((*settings).*setting) : -1;
+    return atBoundary([&]() -> Result<int> {
+        const Result<FtpSettings> settings = loadFtpFile();
+        if (!settings)
+            return settings.error();
+        return static_cast<int>((*settings).*setting);
     });
 }
 
@@ -27,22 +29,22 @@ LastSeen<_tag_VELT_FTP_CONF_>& lastSeenRecord() {
     return seen;
 }
 
-int readRecord(_tag_VELT_FTP_CONF_& record) {
+Result<> readRecord(_tag_VELT_FTP_CONF_& record) {
     lastSeenRecord().forget();
-    const auto settings = loadFtpFile();
+    const Result<FtpSettings> settings = loadFtpFile();
     if (!settings)
-        return -1;
+        return settings.error();
     record = settings->record;
     lastSeenRecord().note(record);
-    return 0;
+    return {};
 }
 
-int storeRecord(const _tag_VELT_FTP_CONF_& record) {
-    const int result = changeFtpSettings([&record](FtpSettings& settings) {
+Result<> storeRecord(const _tag_VELT_FTP_CONF_& record) {
+    const Result<> result = changeFtpSettings([&record](FtpSettings& settings) {
         settings.record = lastSeenRecord().merge(settings.record, record);
     });
     // Not what was stored in the end: the caller goes on with its own copy.
-    if (result >= 0)
+    if (result)
         lastSeenRecord().note(record);
     return result;
 }

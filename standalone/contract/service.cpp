@@ -41,10 +41,10 @@ int setRunKey(const char* service, int value) {
 
 bool isEnabled(std::string_view service, Daemon daemon) {
     if (daemon == Daemon::sftp) {
-        const auto settings = loadSftpSettings();
+        const auto settings = orLastError(loadSftpSettings());
         return settings && settings->enabled;
     }
-    const auto settings = loadFtpSettings();
+    const auto settings = orLastError(loadFtpSettings());
     const int bit = service == "ftpd-ssl" ? VELT_FTP_SERVICE_TLS : VELT_FTP_SERVICE_PLAIN;
     return settings && (settings->record.service_flags & bit) != 0;
 }

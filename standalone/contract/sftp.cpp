@@ -14,23 +14,23 @@ LastSeen<SftpSettings>& lastSeenSettings() {
     return seen;
 }
 
-int readRecord(_tag_VELT_SFTP_CONFIG_& record) {
+Result<> readRecord(_tag_VELT_SFTP_CONFIG_& record) {
     lastSeenSettings().forget();
-    const auto settings = loadSftpSettings();
+    const Result<SftpSettings> settings = loadSftpSettings();
     if (!settings)
-        return -1;
+        return settings.error();
     record = _tag_VELT_SFTP_CONFIG_{};
     record.enable = settings->enabled ? 1 : 0;
     record.port = settings->port;
     lastSeenSettings().note(*settings);
-    return 0;
+    return {};
 }
 
-int storeSettings(const SftpSettings& wanted) {
-    const int result = changeSftpSettings(
+Result<> storeSettings(const SftpSettings& wanted) {
+    const Result<> result = changeSftpSettings(
         [&wanted](SftpSettings& settings) { settings = lastSeenSettings().merge(settings, wanted); });
     // Not what was stored in the end: the caller goes on with its own copy.
-    if (result >= 0)
+    if (result)
         lastSeenSettings().note(wanted);
     return result;
 }

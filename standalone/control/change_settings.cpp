@@ -2,6 +2,7 @@
 
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
+#include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -16,55 +17,64 @@ namespace {
 // The daemon's test needs what the daemon needs: its program, its account, shares that can be read. Settings
 // that switch a service off, or are changed while it is off, must not fail for the want of these; switching
 // it on tests them all.
-int testIfOn(const FtpSettings& settings) {
-    return enablesFtp(settings.record) ? testFtpCandidate(settings) : 0;
+Result<> testIfOn(const FtpSettings& settings) {
+    if (enablesFtp(settings.record) && testFtpCandidate(settings) < 0)
+        return lastErrorAsValue();
+    return {};
 }
 
-int testIfOn(const SftpSettings& settings) {
-    return settings.enabled ? testSftpCandidate(settings) : 0;
+Result<> testIfOn(const SftpSettings& settings) {
+    if (settings.enabled && testSftpCandidate(settings) < 0)
+        return lastErrorAsValue();
+    return {};
+}
+
+Result<> check(const FtpSettings& settings) {
+    const Result<> checked = checkFtpSettings(settings);
+    return checked ? testIfOn(settings) : checked;
+}
+
+Result<> check(const SftpSettings& settings) {
+    const Result<> checked = checkSftpSettings(settings);
+    return checked ? testIfOn(settings) : checked;
+}
+
+template<class Settings>
+Result<> changeStored(Result<Settings> (&load)(), const std::function<void(Settings&)>& change,
+                      const std::function<Result<>(const Settings&)>& store) {
+    const StateLock lock;
+    if (!lock)
+        return lastErrorAsValue();
+    Result<Settings> settings = load();
+    if (!settings)
+        return settings.error();
+    change(*settings);
+    const Result<> checked = check(*settings);
+    return checked ? store(*settings) : checked;
+}
+
+Result<> storeExternalAddress(const FtpSettings& settings) {
+    return perform(Effect::store, "external address", [&]() -> Result<> {
+        if (writeKeyValue(statePath(paths::systemInformation), externalAddressKey, settings.externalAddress) <
+            0)
+            return lastErrorAsValue();
+        return {};
+    });
 }
 
 } // namespace
 
-int changeFtpSettings(const std::function<void(FtpSettings&)>& change) {
-    const StateLock lock;
-    if (!lock)
-        return -1;
-    auto settings = loadFtpSettings();
-    if (!settings)
-        return -1;
-    change(*settings);
-    if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
-        return -1;
-    return storeFtpSettings(*settings);
+Result<> changeFtpSettings(const std::function<void(FtpSettings&)>& change) {
+    return changeStored<FtpSettings>(loadFtpSettings, change, storeFtpSettings);
 }
 
-int changeSftpSettings(const std::function<void(SftpSettings&)>& change) {
-    const StateLock lock;
-    if (!lock)
-        return -1;
-    auto settings = loadSftpSettings();
-    if (!settings)
-        return -1;
-    change(*settings);
-    if (checkSftpSettings(*settings) < 0 || testIfOn(*settings) < 0)
-        return -1;
-    return storeSftpSettings(*settings);
+Result<> changeSftpSettings(const std::function<void(SftpSettings&)>& change) {
+    return changeStored<SftpSettings>(loadSftpSettings, change, storeSftpSettings);
 }
 
-int changeExternalAddress(const std::string& address) {
-    const StateLock lock;
-    if (!lock)
-        return -1;
-    auto settings = loadFtpFile();
-    if (!settings)
-        return -1;
-    settings->externalAddress = address;
-    if (checkFtpSettings(*settings) < 0 || testIfOn(*settings) < 0)
-        return -1;
-    return perform(Effect::store, "external address", [&] {
-        return writeKeyValue(statePath(paths::systemInformation), externalAddressKey, address);
-    });
+Result<> changeExternalAddress(const std::string& address) {
+    const auto change = [&](FtpSettings& settings) { settings.externalAddress = address; };
+    return changeStored<FtpSettings>(loadFtpFile, change, storeExternalAddress);
 }
 
 } // namespace velt

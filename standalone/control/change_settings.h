@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_CONTROL_CHANGE_SETTINGS_H
 #define VELT_STANDALONE_CONTROL_CHANGE_SETTINGS_H
 
+#include "base/result.h"
 #include "standalone/settings/settings.h"
 
 #include <functional>
@@ -9,14 +10,14 @@
 
 namespace velt {
 
-/// Reads the settings, lets `change` change them, and stores them after the checks here and the daemon's own
-/// test have passed, all under the StateLock. Settings of a service that is off are not put to the daemon: it
-/// may be what is broken. Negative on failure, with the last error set; nothing is stored then.
-int changeFtpSettings(const std::function<void(FtpSettings&)>& change);
-int changeSftpSettings(const std::function<void(SftpSettings&)>& change);
+/// Reads the settings, lets `change` change them, and stores them after they have passed the platform's
+/// checks and the daemon's own test, all under the StateLock. Settings of a service that is off are not put
+/// to the daemon: it may be what is broken. After an error nothing is stored.
+Result<> changeFtpSettings(const std::function<void(FtpSettings&)>& change);
+Result<> changeSftpSettings(const std::function<void(SftpSettings&)>& change);
 
-/// Stores the external address in the same manner.
-int changeExternalAddress(const std::string& address);
+/// Stores the external address in the same way.
+Result<> changeExternalAddress(const std::string& address);
 
 } // namespace velt
 

@@ -68,14 +68,14 @@ NextStart nextStart(Daemon daemon, const ServiceState& now) {
     const bool serving = isServing(now);
     const auto portIsFree = [&now](int port) { return probePorts({port}, now.daemon.pid) >= 0; };
     if (daemon == Daemon::ftp) {
-        const auto settings = loadFtpSettings();
+        const auto settings = orLastError(loadFtpSettings());
         if (!settings || !enablesFtp(settings->record)) {
             return {};
         }
         return {true,
                 !serving || (portIsFree(controlPort(settings->record)) && testFtpCandidate(*settings) >= 0)};
     }
-    const auto settings = loadSftpSettings();
+    const auto settings = orLastError(loadSftpSettings());
     if (!settings || !settings->enabled) {
         return {};
     }
@@ -94,17 +94,17 @@ int followedByFirewall(int result) {
 /// Nothing, with the last error set, when the settings cannot be read.
 std::optional<bool> isEnabled(Daemon daemon) {
     if (daemon == Daemon::ftp) {
-        const auto settings = loadFtpSettings();
+        const auto settings = orLastError(loadFtpSettings());
         return settings ? std::optional(enablesFtp(settings->record)) : std::nullopt;
     }
-    const auto settings = loadSftpSettings();
+    const auto settings = orLastError(loadSftpSettings());
     return settings ? std::optional(settings->enabled) : std::nullopt;
 }
 
 int startPlanned(Daemon daemon) {
     const auto backend = makeServiceBackend(daemonName(daemon));
     if (daemon == Daemon::ftp) {
-        const auto settings = loadFtpSettings();
+        const auto settings = orLastError(loadFtpSettings());
         if (!settings) {
             return -1;
         }

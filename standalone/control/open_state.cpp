@@ -10,7 +10,7 @@ namespace velt {
 int openState(const std::filesystem::path& root) {
     return atBoundary([&] {
         setStateRoot(root);
-        const int result = writeMissingSettings();
+        const Result<> result = writeMissingSettings();
         sweepScratchFolders();
         return result;
     });

@@ -58,8 +58,8 @@ Conflict heldBy(int port, const std::string& holder) {
 }
 
 std::optional<ConfiguredPorts> loadConfiguredPorts() {
-    const auto ftp = loadFtpSettings();
-    const auto sftp = loadSftpSettings();
+    const auto ftp = orLastError(loadFtpSettings());
+    const auto sftp = orLastError(loadSftpSettings());
     if (!ftp || !sftp) {
         return std::nullopt;
     }

@@ -23,7 +23,7 @@ int startOrStop(Daemon daemon, bool wanted) {
 int startEnabledServices() {
     return atBoundary([] {
         followWithFirewall(); // its rules went with the boot as well
-        const auto ftp = loadFtpSettings();
+        const auto ftp = orLastError(loadFtpSettings());
         const int ftpResult = ftp ? startOrStop(Daemon::ftp, enablesFtp(ftp->record)) : -1;
         if (ftpResult < 0) {
             ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
@@ -32,7 +32,7 @@ int startEnabledServices() {
         if (ftpResult < 0) {
             first.emplace();
         }
-        const auto sftp = loadSftpSettings();
+        const auto sftp = orLastError(loadSftpSettings());
         const int sftpResult = sftp ? startOrStop(Daemon::sftp, sftp->enabled) : -1;
         if (sftpResult < 0) {
             ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());

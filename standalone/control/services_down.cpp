@@ -34,13 +34,13 @@ void addIfDown(Daemon daemon, std::vector<ServiceDown>& down) {
 std::vector<ServiceDown> servicesDown() {
     const LastErrorKept kept;
     std::vector<ServiceDown> down;
-    const auto ftp = loadFtpSettings();
+    const auto ftp = orLastError(loadFtpSettings());
     if (!ftp) {
         down.push_back({"ftp", lastErrorSentence(), isServing(daemonState(Daemon::ftp))});
     } else if (enablesFtp(ftp->record)) {
         addIfDown(Daemon::ftp, down);
     }
-    const auto sftp = loadSftpSettings();
+    const auto sftp = orLastError(loadSftpSettings());
     if (!sftp) {
         down.push_back({"sftp", lastErrorSentence(), isServing(daemonState(Daemon::sftp))});
     } else if (sftp->enabled) {

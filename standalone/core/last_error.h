@@ -5,6 +5,7 @@
 #include "standalone/core/error_number.h"
 
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace velt {
@@ -18,6 +19,15 @@ int fail(const Error& error);
 
 /// The calling thread's last error as a value.
 Error lastErrorAsValue();
+
+/// The value; or nothing, with the calling thread's last error set, for callers that do not give a Result
+/// yet.
+template<class Value> std::optional<Value> orLastError(Result<Value> result) {
+    if (result)
+        return *std::move(result);
+    fail(result.error());
+    return std::nullopt;
+}
 
 /// The kind of the calling thread's last error; none when there was none.
 ErrorNumber lastErrorNumber();

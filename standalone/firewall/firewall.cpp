@@ -118,8 +118,8 @@ int loadFirewallRules() {
     if (off && !rulesWereLoaded()) {
         return 0; // nothing to take away, and perhaps no right to do it
     }
-    const auto ftp = loadFtpSettings();
-    const auto sftp = loadSftpSettings();
+    const auto ftp = orLastError(loadFtpSettings());
+    const auto sftp = orLastError(loadSftpSettings());
     if (!ftp || !sftp) {
         return -1;
     }

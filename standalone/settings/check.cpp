@@ -1,8 +1,7 @@
-#include "standalone/core/last_error.h"
+#include "base/ipv4.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/quoted_text.h"
 #include "standalone/settings/settings.h"
-
-#include <arpa/inet.h>
 
 #include <charconv>
 #include <cstring>
@@ -14,35 +13,35 @@ namespace {
 constexpr int highestPort = 65535;
 constexpr int lowestPassivePort = 1024;
 
-int refuse(std::string sentence, SourcePlace where = SourcePlace::current()) {
-    return fail(ErrorNumber::invalid, std::move(sentence), where);
+Error refuse(std::string sentence, SourcePlace where = SourcePlace::current()) {
+    return {ErrorNumber::invalid, std::move(sentence), where};
 }
 
 std::string rangeText(const VELT_FTP_PORT_RANGE& range) {
     return std::to_string(range.first) + " to " + std::to_string(range.last);
 }
 
-int checkText(const char* setting, std::string_view field) {
+Result<> checkText(const char* setting, std::string_view field) {
     if (field.find('\0') == std::string_view::npos)
         return refuse(std::string("The ") + setting + " does not end within its " +
                       std::to_string(field.size()) + " bytes.");
-    return 0;
+    return {};
 }
 
 std::string_view fieldOf(const char* bytes, std::size_t size) {
     return {bytes, size};
 }
 
-int checkPort(const _tag_VELT_FTP_CONF_& record) {
-    if (checkText("FTP port", fieldOf(record.portnum, sizeof(record.portnum))) < 0)
-        return -1;
+Result<> checkPort(const _tag_VELT_FTP_CONF_& record) {
+    if (Result<> fits = checkText("FTP port", fieldOf(record.portnum, sizeof(record.portnum))); !fits)
+        return fits;
     if (controlPort(record) == 0)
         return refuse("The FTP port is " + quotedText(record.portnum) +
                       "; it has to be a decimal number from 1 to 65535.");
-    return 0;
+    return {};
 }
 
-int checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
+Result<> checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
     const VELT_FTP_PORT_RANGE range = passiveRange(record);
     if (range.first < lowestPassivePort || range.first > highestPort || range.last < lowestPassivePort ||
         range.last > highestPort)
@@ -58,7 +57,7 @@ int checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
     if (port >= range.first && port <= range.last)
         return refuse("The passive port range " + rangeText(range) + " contains the FTP port " +
                       std::to_string(port) + "; they have to be apart.");
-    return 0;
+    return {};
 }
 
 } // namespace
@@ -87,32 +86,29 @@ VELT_FTP_PORT_RANGE passiveRange(const _tag_VELT_FTP_CONF_& record) {
     return {record.passive_port_min, record.passive_port_max};
 }
 
-bool isIPv4Address(const std::string& text) {
-    in_addr address{};
-    // c_str() would hide what stands behind a NUL byte.
-    return text.find('\0') == std::string::npos && ::inet_pton(AF_INET, text.c_str(), &address) == 1;
-}
-
-int checkFtpSettings(const FtpSettings& settings) {
+Result<> checkFtpSettings(const FtpSettings& settings) {
     const _tag_VELT_FTP_CONF_& record = settings.record;
-    if (checkPort(record) < 0 || checkPassiveRange(record) < 0 ||
-        checkText("name of the anonymous share",
-                  fieldOf(record.anonymous_chroot_share, sizeof(record.anonymous_chroot_share))) < 0)
-        return -1;
+    if (Result<> port = checkPort(record); !port)
+        return port;
+    if (Result<> range = checkPassiveRange(record); !range)
+        return range;
+    const auto share = fieldOf(record.anonymous_chroot_share, sizeof(record.anonymous_chroot_share));
+    if (Result<> fits = checkText("name of the anonymous share", share); !fits)
+        return fits;
     if (settings.timeout < 0)
         return refuse("The FTP time-out is " + std::to_string(settings.timeout) +
                       " seconds; it has to be 0 (never) or more.");
-    if (!settings.externalAddress.empty() && !isIPv4Address(settings.externalAddress))
+    if (!settings.externalAddress.empty() && !parseIPv4(settings.externalAddress))
         return refuse("The external address is " + quotedText(settings.externalAddress) +
                       "; it has to be an IPv4 address such as 192.0.2.1, or empty.");
-    return 0;
+    return {};
 }
 
-int checkSftpSettings(const SftpSettings& settings) {
+Result<> checkSftpSettings(const SftpSettings& settings) {
     if (settings.port < 1 || settings.port > highestPort)
         return refuse("The SFTP port is " + std::to_string(settings.port) +
                       "; it has to be from 1 to 65535.");
-    return 0;
+    return {};
 }
 
 } // namespace velt

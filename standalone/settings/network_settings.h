@@ -2,7 +2,7 @@
 #ifndef VELT_STANDALONE_SETTINGS_NETWORK_SETTINGS_H
 #define VELT_STANDALONE_SETTINGS_NETWORK_SETTINGS_H
 
-#include <optional>
+#include "base/result.h"
 
 namespace velt {
 
@@ -15,9 +15,8 @@ struct NetworkSettings {
 ///     version = 1
 ///     loopback_only = 1
 ///
-/// Nothing, with the last error naming file and line, when the file cannot be read or is damaged.
 /// Thread-safe.
-std::optional<NetworkSettings> loadNetworkSettings();
+Result<NetworkSettings> loadNetworkSettings();
 
 } // namespace velt
 

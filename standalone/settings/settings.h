@@ -2,9 +2,9 @@
 #ifndef VELT_STANDALONE_SETTINGS_SETTINGS_H
 #define VELT_STANDALONE_SETTINGS_SETTINGS_H
 
+#include "base/result.h"
 #include "ftp/ftp_library.h"
 
-#include <optional>
 #include <string>
 
 namespace velt {
@@ -33,8 +33,8 @@ inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
 FtpSettings defaultFtpSettings();
 
 /// Writes the default settings into the files that are not there yet; leaves the others alone, whatever they
-/// hold. Negative on failure, with the last error set.
-int writeMissingSettings();
+/// hold.
+Result<> writeMissingSettings();
 
 /// The control port of the record; 0 when its text is no decimal number of 1 to 65535.
 int controlPort(const _tag_VELT_FTP_CONF_& record);
@@ -48,18 +48,15 @@ bool hasCustomPassiveRange(const _tag_VELT_FTP_CONF_& record);
 /// The passive range in force: the custom one, or the default.
 VELT_FTP_PORT_RANGE passiveRange(const _tag_VELT_FTP_CONF_& record);
 
-/// Whether the text is a dotted IPv4 address ("192.0.2.1").
-bool isIPv4Address(const std::string& text);
+/// The stored settings, the defaults before the first store. Errors name the file and, where it is damaged,
+/// the line.
+Result<FtpSettings> loadFtpSettings();
+Result<SftpSettings> loadSftpSettings();
 
-/// The stored settings, the defaults before the first store; nothing, with the last error set (file and
-/// line), when a file cannot be read or is damaged.
-std::optional<FtpSettings> loadFtpSettings();
-std::optional<SftpSettings> loadSftpSettings();
-
-/// Whether a daemon would take these settings: negative, with the last error's sentence naming the setting,
-/// the value and what is allowed, when it would not. Looks at numbers and texts only, starts nothing.
-int checkFtpSettings(const FtpSettings& settings);
-int checkSftpSettings(const SftpSettings& settings);
+/// Whether a daemon would take these settings; errors name the setting, the value and what is allowed. Looks
+/// at numbers and texts only, starts nothing.
+Result<> checkFtpSettings(const FtpSettings& settings);
+Result<> checkSftpSettings(const SftpSettings& settings);
 
 } // namespace velt
 

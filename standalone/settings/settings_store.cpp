@@ -1,5 +1,6 @@
 #include "standalone/settings/settings_store.h"
 
+#include "base/ipv4.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/key_value_file.h"
@@ -24,25 +25,21 @@ template<class Settings>
 using Parse = Result<Settings> (*)(const std::string& name, std::string_view contents);
 
 template<class Settings>
-std::optional<Settings> loadFile(std::string_view name, Parse<Settings> parse, const Settings& defaults) {
+Result<Settings> loadFile(std::string_view name, Parse<Settings> parse, const Settings& defaults) {
     const auto path = statePath(name);
-    const auto contents = readFile(path);
-    if (contents) {
-        if (Result<Settings> settings = parse(path.string(), *contents))
-            return *settings;
-        else
-            fail(settings.error());
-        return std::nullopt;
-    }
+    if (const auto contents = readFile(path))
+        return parse(path.string(), *contents);
     if (errno == ENOENT)
         return defaults;
-    fail(ErrorNumber::store, "Cannot read " + path.string() + ": " + std::strerror(errno) + ".");
-    return std::nullopt;
+    return Error(ErrorNumber::store, "Cannot read " + path.string() + ": " + std::strerror(errno) + ".");
 }
 
-int storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
-    return perform(Effect::store, subject,
-                   [&] { return replaceFile(statePath(name), contents, settingsMode); });
+Result<> storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
+    return perform(Effect::store, subject, [&]() -> Result<> {
+        if (replaceFile(statePath(name), contents, settingsMode) < 0)
+            return lastErrorAsValue();
+        return {};
+    });
 }
 
 bool isMissing(std::string_view name) {
@@ -58,43 +55,43 @@ FtpSettings defaultFtpSettings() {
     return settings;
 }
 
-std::optional<FtpSettings> loadFtpFile() {
+Result<FtpSettings> loadFtpFile() {
     return loadFile<FtpSettings>(paths::ftpSettings, parseFtpSettings, defaultFtpSettings());
 }
 
-std::optional<FtpSettings> loadFtpSettings() {
-    auto settings = loadFtpFile();
+Result<FtpSettings> loadFtpSettings() {
+    Result<FtpSettings> settings = loadFtpFile();
     if (!settings)
-        return std::nullopt;
+        return settings;
     const auto file = statePath(paths::systemInformation);
     if (readKeyValue(file, externalAddressKey, settings->externalAddress) < 0)
-        return std::nullopt;
-    if (!settings->externalAddress.empty() && !isIPv4Address(settings->externalAddress)) {
-        fail(ErrorNumber::damaged, "File " + file.string() + ": the value of ftp_ext_ip is no IPv4 address.");
-        return std::nullopt;
-    }
+        return lastErrorAsValue();
+    if (!settings->externalAddress.empty() && !parseIPv4(settings->externalAddress))
+        return Error(ErrorNumber::damaged,
+                     "File " + file.string() + ": the value of ftp_ext_ip is no IPv4 address.");
     return settings;
 }
 
-std::optional<SftpSettings> loadSftpSettings() {
+Result<SftpSettings> loadSftpSettings() {
     return loadFile<SftpSettings>(paths::sftpSettings, parseSftpSettings, SftpSettings());
 }
 
-int storeFtpSettings(const FtpSettings& settings) {
+Result<> storeFtpSettings(const FtpSettings& settings) {
     return storeFile("ftp settings", paths::ftpSettings, formatFtpSettings(settings));
 }
 
-int storeSftpSettings(const SftpSettings& settings) {
+Result<> storeSftpSettings(const SftpSettings& settings) {
     return storeFile("sftp settings", paths::sftpSettings, formatSftpSettings(settings));
 }
 
-int writeMissingSettings() {
+Result<> writeMissingSettings() {
     const StateLock lock;
     if (!lock)
-        return -1;
-    if (isMissing(paths::ftpSettings) && storeFtpSettings(defaultFtpSettings()) < 0)
-        return -1;
-    return isMissing(paths::sftpSettings) ? storeSftpSettings(SftpSettings()) : 0;
+        return lastErrorAsValue();
+    if (isMissing(paths::ftpSettings))
+        if (Result<> stored = storeFtpSettings(defaultFtpSettings()); !stored)
+            return stored;
+    return isMissing(paths::sftpSettings) ? storeSftpSettings(SftpSettings()) : Result<>();
 }
 
 } // namespace velt

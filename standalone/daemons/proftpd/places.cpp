@@ -99,7 +99,7 @@ std::optional<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
         return std::nullopt;
     }
     const bool tls = (settings.record.service_flags & VELT_FTP_SERVICE_TLS) != 0;
-    const auto network = loadNetworkSettings();
+    const auto network = orLastError(loadNetworkSettings());
     if (!network) {
         return std::nullopt;
     }

@@ -1,6 +1,7 @@
 #include "standalone/daemons/daemon_plan.h"
 
 #include "base/sha256.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
@@ -91,7 +92,7 @@ int testFtpCandidate(const FtpSettings& settings) {
 
 std::optional<DaemonPlan> planFtpDaemon() {
     const StateLock lock;
-    const auto settings = lock ? loadFtpSettings() : std::nullopt;
+    const auto settings = lock ? orLastError(loadFtpSettings()) : std::nullopt;
     if (!settings) {
         return std::nullopt;
     }
@@ -99,7 +100,7 @@ std::optional<DaemonPlan> planFtpDaemon() {
         fail(ErrorNumber::invalid, "Neither FTP nor FTPS is enabled.");
         return std::nullopt;
     }
-    const auto found = checkFtpSettings(*settings) < 0 ? std::nullopt : surveyFtp(*settings);
+    const auto found = toContract(checkFtpSettings(*settings)) < 0 ? std::nullopt : surveyFtp(*settings);
     if (!found || testRendering(*settings, found->places) < 0) {
         return std::nullopt;
     }

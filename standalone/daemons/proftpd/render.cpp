@@ -1,6 +1,6 @@
 #include "standalone/daemons/proftpd/render.h"
 
-#include <arpa/inet.h>
+#include "base/ipv4.h"
 
 #include <algorithm>
 #include <array>
@@ -77,17 +77,6 @@ void renderModules(Text& text, const FtpSettings& settings, const ProftpdPlaces&
     }
 }
 
-// The address as the parser understood it, so that not even a text which it accepted is passed on.
-std::optional<std::string> ipv4(const std::string& text) {
-    in_addr parsed{};
-    std::array<char, INET_ADDRSTRLEN> written{};
-    if (text.find('\0') != std::string::npos || inet_pton(AF_INET, text.c_str(), &parsed) != 1 ||
-        inet_ntop(AF_INET, &parsed, written.data(), written.size()) == nullptr) {
-        return std::nullopt;
-    }
-    return written.data();
-}
-
 void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
     const auto& record = settings.record;
     const bool ipv6 = places.ipv6 && !places.loopbackOnly;
@@ -101,9 +90,9 @@ void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlace
     text.line("PassivePorts", custom ? record.passive_port_min : defaultPassiveRange.first,
               custom ? record.passive_port_max : defaultPassiveRange.last);
     // The directive would also take host and interface names, and announce what these resolve to.
-    const auto external = record.use_ext_ip != 0 ? ipv4(settings.externalAddress) : std::nullopt;
+    const auto external = record.use_ext_ip != 0 ? parseIPv4(settings.externalAddress) : std::nullopt;
     if (external) {
-        text.line("MasqueradeAddress", *external);
+        text.line("MasqueradeAddress", toText(*external));
     }
     // Absent, it guards the active side only.
     text.line("AllowForeignAddress", record.enable_fxp != 0 ? "on" : "off");

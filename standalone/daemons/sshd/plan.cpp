@@ -1,4 +1,5 @@
 #include "base/sha256.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
@@ -44,7 +45,7 @@ std::optional<std::string> rendering(const SftpSettings& settings) {
                                        " has a name that the SFTP daemon's configuration cannot hold.");
         return std::nullopt;
     }
-    const auto network = loadNetworkSettings();
+    const auto network = orLastError(loadNetworkSettings());
     if (!network) {
         return std::nullopt;
     }
@@ -69,8 +70,8 @@ int testSftpCandidate(const SftpSettings& settings) {
 
 std::optional<DaemonPlan> planSftpDaemon() {
     const StateLock lock;
-    const auto settings = lock ? loadSftpSettings() : std::nullopt;
-    if (!settings || checkSftpSettings(*settings) < 0) {
+    const auto settings = lock ? orLastError(loadSftpSettings()) : std::nullopt;
+    if (!settings || toContract(checkSftpSettings(*settings)) < 0) {
         return std::nullopt;
     }
     const auto text = rendering(*settings);

@@ -1,5 +1,6 @@
 #include "standalone/daemons/tls/self_signed.h"
 
+#include "base/ipv4.h"
 #include "standalone/daemons/tls/openssl_owners.h"
 
 #include <arpa/inet.h>
@@ -56,8 +57,9 @@ bool addHostName(GENERAL_NAMES* names, const std::string& hostName) {
 bool addAddress(GENERAL_NAMES* names, const std::string& address) {
     std::array<unsigned char, sizeof(in6_addr)> bytes{};
     int length = 0;
-    if (inet_pton(AF_INET, address.c_str(), bytes.data()) == 1) {
-        length = sizeof(in_addr);
+    if (const auto ipv4 = parseIPv4(address)) {
+        std::copy(ipv4->begin(), ipv4->end(), bytes.begin());
+        length = static_cast<int>(ipv4->size());
     } else if (inet_pton(AF_INET6, address.c_str(), bytes.data()) == 1) {
         length = sizeof(in6_addr);
     } else {

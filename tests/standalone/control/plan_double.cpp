@@ -37,7 +37,7 @@ std::optional<DaemonPlan> makePlan(int port, const std::string& settings,
 namespace velt {
 
 std::optional<DaemonPlan> planFtpDaemon() {
-    const auto settings = loadFtpSettings();
+    const auto settings = orLastError(loadFtpSettings());
     if (!settings) {
         return std::nullopt;
     }
@@ -49,7 +49,7 @@ std::optional<DaemonPlan> planFtpDaemon() {
 }
 
 std::optional<DaemonPlan> planSftpDaemon() {
-    const auto settings = loadSftpSettings();
+    const auto settings = orLastError(loadSftpSettings());
     return settings ? test::makePlan(settings->port, std::to_string(settings->port),
                                      test::planDouble().sftpOptions)
                     : std::nullopt;

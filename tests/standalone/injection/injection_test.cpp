@@ -261,7 +261,7 @@ protected:
     /// That what stands beside the text is as it was.
     static void expectNeighbours() {
         EXPECT_EQ(VELTFTPTimeOutGet(), 77) << lastErrorSentence();
-        EXPECT_TRUE(loadFtpSettings()) << lastErrorSentence();
+        EXPECT_TRUE(loadFtpSettings());
         _tag_VELT_SFTP_CONFIG_ sftp{};
         EXPECT_GE(VELTSFTPConfigGet(1, &sftp), 0);
         EXPECT_EQ(sftp.port, 2345);

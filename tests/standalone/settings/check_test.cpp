@@ -1,4 +1,3 @@
-#include "standalone/core/last_error.h"
 #include "standalone/settings/settings.h"
 
 #include <gtest/gtest.h>
@@ -15,8 +14,8 @@ using Change = std::function<void(FtpSettings&)>;
 std::string problemAfter(const Change& change) {
     FtpSettings settings = defaultFtpSettings();
     change(settings);
-    clearLastError();
-    return checkFtpSettings(settings) < 0 ? lastErrorSentence() : "";
+    const Result<> checked = checkFtpSettings(settings);
+    return checked ? "" : checked.error().message;
 }
 
 Change port(const char* text) {
@@ -141,10 +140,11 @@ TEST(CheckFtp, TheExternalAddressIsIPv4OrEmpty) {
 
 TEST(CheckSftp, ThePortIsFrom1To65535) {
     for (const int number : {1, 22, 65535})
-        EXPECT_EQ(checkSftpSettings({true, number}), 0);
+        EXPECT_TRUE(checkSftpSettings({true, number}));
     for (const int number : {INT_MIN, -1, 0, 65536, INT_MAX}) {
-        EXPECT_LT(checkSftpSettings({true, number}), 0);
-        EXPECT_EQ(lastErrorSentence(),
+        const Result<> checked = checkSftpSettings({true, number});
+        ASSERT_FALSE(checked);
+        EXPECT_EQ(checked.error().message,
                   "The SFTP port is " + std::to_string(number) + "; it has to be from 1 to 65535.");
     }
 }

@@ -41,8 +41,9 @@ TEST_F(SettingsStore, TheExternalAddressComesFromTheSystemInformation) {
 
 TEST_F(SettingsStore, ADamagedExternalAddressIsAnErrorThatCanBeRepaired) {
     root_.write("etc/veltinfo.conf", "ftp_ext_ip=eth0\n");
-    EXPECT_FALSE(loadFtpSettings().has_value());
-    EXPECT_EQ(lastErrorSentence(),
+    const auto settings = loadFtpSettings();
+    ASSERT_FALSE(settings);
+    EXPECT_EQ(settings.error().message,
               "File " + place("/etc/veltinfo.conf") + ": the value of ftp_ext_ip is no IPv4 address.");
     ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
     EXPECT_EQ(loadFtpSettings()->externalAddress, "203.0.113.7");
@@ -50,8 +51,9 @@ TEST_F(SettingsStore, ADamagedExternalAddressIsAnErrorThatCanBeRepaired) {
 
 TEST_F(SettingsStore, AnUnreadableFileIsNoMissingFile) {
     std::filesystem::create_directories(place("/etc/velt/ftp.conf"));
-    EXPECT_FALSE(loadFtpSettings().has_value());
-    EXPECT_EQ(lastErrorSentence(), "Cannot read " + place("/etc/velt/ftp.conf") + ": Is a directory.");
+    const auto settings = loadFtpSettings();
+    ASSERT_FALSE(settings);
+    EXPECT_EQ(settings.error().message, "Cannot read " + place("/etc/velt/ftp.conf") + ": Is a directory.");
 }
 
 TEST_F(SettingsStore, AHandEditedValueThatNoDaemonTakesIsRepairedByStoringAGoodOne) {
