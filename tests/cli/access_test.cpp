@@ -55,7 +55,7 @@ TEST_F(AccessTest, ATokenIsNotSentUnencryptedToAnotherMachine) {
     }
 }
 
-TEST_F(AccessTest, AnAddressThatIsNoneIsAUsageError) {
+TEST_F(AccessTest, AnInvalidAddressIsAUsageError) {
     for (const char* url : {"ftp://127.0.0.1", "127.0.0.1:80", "http://", "file:///etc/passwd"}) {
         EXPECT_EQ(run({"--url", url, "status"}).code, 2) << url;
     }
@@ -81,7 +81,7 @@ TEST_F(AccessTest, ARefusedConnectionNamesTheAddress) {
     EXPECT_NE(result.err.find("--url"), std::string::npos) << result.err;
 }
 
-TEST_F(AccessTest, AConnectionThatEndsWithoutAnAnswerIsNoConnection) {
+TEST_F(AccessTest, AConnectionThatEndsWithoutAnAnswerIsAnError) {
     HttpReply nothing;
     nothing.drop = true;
     host.answerWith("GET /api/status", nothing);

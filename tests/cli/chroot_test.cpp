@@ -80,7 +80,7 @@ TEST_F(ChrootTest, ARuleThatIsThereIsNotStoredAgain) {
     EXPECT_TRUE(sent(rulesSave).empty());
 }
 
-TEST_F(ChrootTest, ARuleOfAnUnknownUserIsTold) {
+TEST_F(ChrootTest, ARuleForAnUnknownUserIsReported) {
     const RunResult result = run({"chroot", "rules", "add", "user", "nobody-knows", "/docs"});
     EXPECT_EQ(result.code, 3);
     EXPECT_NE(result.err.find("left out: user nobody-knows /docs"), std::string::npos) << result.err;

@@ -16,7 +16,7 @@
 TemporaryFolder::TemporaryFolder() {
     std::string name = (std::filesystem::temp_directory_path() / "velt-cli-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr) {
-        throw std::runtime_error("no temporary folder");
+        throw std::runtime_error("cannot make a temporary folder");
     }
     path_ = name;
 }
@@ -109,7 +109,7 @@ RunResult runProcess(const std::vector<std::string>& arguments, const std::vecto
     posix_spawn_file_actions_destroy(&actions);
     int status = 0;
     if (error != 0 || waitpid(child, &status, 0) != child) {
-        throw std::runtime_error("the program could not be run: " + words.front());
+        throw std::runtime_error("cannot run " + words.front());
     }
     return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), contentOf(out), contentOf(err)};
 }

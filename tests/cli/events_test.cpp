@@ -33,7 +33,7 @@ public:
     explicit RunningProgram(const std::string& socket) {
         int ends[2] = {-1, -1};
         if (pipe2(ends, O_CLOEXEC) != 0) {
-            throw std::runtime_error("no pipe");
+            throw std::runtime_error("cannot make a pipe");
         }
         posix_spawn_file_actions_t actions;
         posix_spawn_file_actions_init(&actions);
@@ -48,7 +48,7 @@ public:
         close(ends[1]);
         output_ = ends[0];
         if (error != 0) {
-            throw std::runtime_error("the program could not be started");
+            throw std::runtime_error("cannot start the program");
         }
     }
     ~RunningProgram() { close(output_); }
@@ -114,7 +114,7 @@ TEST_F(EventsTest, ProgramsGetOneObjectPerLine) {
               jsonOf(R"({"event": "service", "data": {"service": "ftpd", "action": "start"}})"));
 }
 
-TEST_F(EventsTest, AnInterruptionEndsTheCommandWell) {
+TEST_F(EventsTest, AnInterruptionEndsTheCommandWithSuccess) {
     answer(true);
     interrupted = true;
     EXPECT_EQ(run({"events"}).code, 0);
@@ -128,7 +128,7 @@ TEST_F(EventsTest, TheInterruptedProgramLeavesWithZero) {
     EXPECT_EQ(program.interrupt(), 0);
 }
 
-TEST_F(EventsTest, AStreamThatTheServerEndsIsNoSuccess) {
+TEST_F(EventsTest, AStreamThatTheServerClosesIsAnError) {
     answer(false);
     const RunResult result = run({"events"});
     EXPECT_EQ(result.code, 6);
@@ -136,7 +136,7 @@ TEST_F(EventsTest, AStreamThatTheServerEndsIsNoSuccess) {
     EXPECT_NE(result.err.find("closed the stream"), std::string::npos);
 }
 
-TEST_F(EventsTest, ARefusalIsNoStream) {
+TEST_F(EventsTest, ARefusedStreamIsAnError) {
     host.answerWith("GET /events", problemReply(401, R"({"title": "Who asks?"})"));
     const RunResult result = run({"events"});
     EXPECT_EQ(result.code, 6);

@@ -97,7 +97,7 @@ TEST_F(ExitCodesTest, NoConnectionOrAccess) {
     EXPECT_EQ(codeOf({"status", "--socket", folder.path("absent")}), 6);
 }
 
-TEST_F(ExitCodesTest, AFullOutputIsNoSuccess) {
+TEST_F(ExitCodesTest, AFullOutputIsAnError) {
     const RunResult result = runProcess({"/bin/sh", "-c", "exec \"$0\" sftp get >/dev/full", VELTCTL},
                                         {"VELT_SOCKET=" + server.socketPath()});
     EXPECT_EQ(result.code, 1);
@@ -110,7 +110,7 @@ TEST_F(ExitCodesTest, AShareThatCannotBeReachedIsAConflictOfItsOwn) {
     EXPECT_NE(last.err.find("veltctl shares"), std::string::npos) << last.err;
 }
 
-TEST_F(ExitCodesTest, AProblemOfAnyFormIsTold) {
+TEST_F(ExitCodesTest, AProblemOfAnyFormIsReported) {
     for (const char* body : {"", "<html>", "[]", R"({"errors": 5, "title": {"a": 1}, "code": null})",
                              R"({"errors": [5, {"field": 7}]})"}) {
         host.answerWith(ftpSet, problemReply(422, body));

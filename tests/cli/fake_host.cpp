@@ -53,7 +53,7 @@ Json::Value jsonOf(const std::string& text) {
     Json::Value value;
     std::string errors;
     if (!reader->parse(text.data(), text.data() + text.size(), &value, &errors)) {
-        throw std::invalid_argument("no JSON: " + text);
+        throw std::invalid_argument("not JSON: " + text);
     }
     return value;
 }

@@ -69,7 +69,7 @@ TEST_F(LogTest, AnAgeBecomesATime) {
     EXPECT_EQ(target.substr(0, 36), "GET /api/log?limit=50&since=" + before.substr(0, 8)) << target;
 }
 
-TEST_F(LogTest, ATimeThatIsNoneIsAUsageError) {
+TEST_F(LogTest, AnInvalidTimeIsAUsageError) {
     for (const char* time : {"yesterday", "2w", "h", "-3h", "2026", "26-11-2021"}) {
         EXPECT_EQ(run({"log", std::string("--since=") + time}).code, 2) << time;
     }

@@ -39,6 +39,6 @@ TEST(EventStreamTest, LinesOfDataAreJoined) {
     EXPECT_EQ(eventsOf({"data: a\ndata:\ndata:  b\n\n"}), Events{"message|a\n\n b"});
 }
 
-TEST(EventStreamTest, CommentsAndUnknownFieldsAreNoEvents) {
+TEST(EventStreamTest, CommentsAndUnknownFieldsAreIgnored) {
     EXPECT_EQ(eventsOf({": heartbeat\n\nretry: 5\n\nevent: lonely\n\ndata\n\n"}), Events{"message|"});
 }

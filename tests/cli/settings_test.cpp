@@ -50,7 +50,7 @@ TEST_F(SettingsTest, AServiceThatIsDownStaysSwitchedOn) {
     EXPECT_EQ(result.err, "");
 }
 
-TEST_F(SettingsTest, WhereASwitchIsNotKnownItIsToldWhatWasSent) {
+TEST_F(SettingsTest, AnUnknownSwitchIsReportedWithWhatWasSent) {
     host.tellsWanted = false;
     const RunResult result = run({"sftp", "set", "portnum=2222"});
     EXPECT_EQ(result.code, 0);
@@ -78,7 +78,7 @@ TEST_F(SettingsTest, TheExternalAddressCanBeTakenAway) {
     EXPECT_EQ(sent(ftpSet).at(0)["ext_ip"], " ") << "the server refuses an empty text";
 }
 
-TEST_F(SettingsTest, AnEmptyRangeIsNone) {
+TEST_F(SettingsTest, AnEmptyRangeIsRefused) {
     const RunResult result = run({"ftp", "set", "custom_port="});
     EXPECT_EQ(result.code, 2);
     EXPECT_NE(result.err.find("custom_port_range=off"), std::string::npos) << result.err;
@@ -151,7 +151,7 @@ TEST_F(SettingsTest, TheRangesSwitchAloneTakesTheRangeAlong) {
     EXPECT_FALSE(sent(ftpSet).at(1).isMember("custom_port"));
 }
 
-TEST_F(SettingsTest, NothingDifferentIsSaid) {
+TEST_F(SettingsTest, AChangeWithoutEffectIsReported) {
     EXPECT_EQ(run({"ftp", "set", "portnum=21"}).out, "Nothing changed.\n");
     EXPECT_EQ(sent(ftpSet).size(), 1U); // the server decides
 }
@@ -162,7 +162,7 @@ TEST_F(SettingsTest, SetWritesTheChangesAsJson) {
     EXPECT_EQ(result["settings"], host.ftp);
 }
 
-TEST_F(SettingsTest, AValueThatTheServerPassesOverIsTold) {
+TEST_F(SettingsTest, AValueThatTheServerIgnoresIsReported) {
     host.answerWith(ftpSet, HttpReply{204, "", "", false, false});
     const RunResult result = run({"ftp", "set", "utf8_mode=2"});
     EXPECT_EQ(result.code, 0);

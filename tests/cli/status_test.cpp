@@ -63,7 +63,7 @@ TEST_F(StatusTest, AnAnswerOfAnotherFormIsNotGuessedAt) {
     }
 }
 
-TEST_F(StatusTest, AnAnswerThatIsNoJsonIsNoServerOfOurs) {
+TEST_F(StatusTest, AnAnswerThatIsNotJsonIsNotFromVeltd) {
     answer("<html>");
     EXPECT_EQ(run({"status"}).code, 6);
     answer("{\"a\": 1} trailing");
