@@ -3,6 +3,7 @@
 #define VELT_BASE_RESULT_H
 
 #include <string>
+#include <type_traits>
 #include <utility>
 #include <variant>
 
@@ -44,12 +45,19 @@ template<class Value = void> class [[nodiscard]] Result {
 public:
     Result(Value value) : outcome_(std::move(value)) {}
     Result(Error error) : outcome_(std::move(error)) {}
+    /// From what a value can be made of, such as std::nullopt or a literal.
+    template<class From>
+    requires std::is_convertible_v<From, Value> &&(!std::is_same_v<std::remove_cvref_t<From>, Value>)&&(
+        !std::is_same_v<std::remove_cvref_t<From>, Error>)Result(From&& value)
+        : outcome_(Value(std::forward<From>(value))) {}
 
     explicit operator bool() const { return std::holds_alternative<Value>(outcome_); }
     Value& operator*() { return std::get<Value>(outcome_); }
     const Value& operator*() const { return std::get<Value>(outcome_); }
     Value* operator->() { return &std::get<Value>(outcome_); }
     const Value* operator->() const { return &std::get<Value>(outcome_); }
+    Value valueOr(Value otherwise) const { return *this ? **this : std::move(otherwise); }
+    friend bool operator==(const Result& result, const Value& value) { return result && *result == value; }
     Error& error() { return std::get<Error>(outcome_); }
     const Error& error() const { return std::get<Error>(outcome_); }
 

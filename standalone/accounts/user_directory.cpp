@@ -1,10 +1,10 @@
 #include "standalone/accounts/user_directory.h"
 
+#include "base/file.h"
 #include "base/file_stamp.h"
 #include "standalone/accounts/account_snapshot.h"
 #include "standalone/accounts/account_sources.h"
 #include "standalone/accounts/name_service.h"
-#include "standalone/core/file_store.h"
 
 #include <algorithm>
 #include <array>
@@ -80,7 +80,7 @@ bool Directory::isCurrent(const std::optional<Clock::time_point>& readAt) const 
 }
 
 Modules loadModules(const AccountSources& sources) {
-    const std::string configuration = readFile(sources.nsswitch).value_or("");
+    const std::string configuration = readFile(sources.nsswitch).valueOr("");
     Modules modules;
     for (const ModuleName& module : moduleNames) {
         // A module that is installed but not in use knows accounts that cannot log in.
@@ -143,8 +143,8 @@ std::shared_ptr<const UserSnapshot> Directory::users() {
     if (users_ != nullptr && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
         return users_;
     }
-    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).value_or("")), remoteUsers_,
-                                parseLoginDefs(readFile(sources_.loginDefs).value_or("")));
+    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).valueOr("")), remoteUsers_,
+                                parseLoginDefs(readFile(sources_.loginDefs).valueOr("")));
     passwdStamp_ = passwd;
     loginDefsStamp_ = loginDefs;
     return users_;
@@ -154,7 +154,7 @@ std::shared_ptr<const GroupSnapshot> Directory::groups() {
     const std::lock_guard lock(mutex_);
     const FileStamp stamp = FileStamp::of(sources_.group);
     if (groups_ == nullptr || !(stamp == groupStamp_)) {
-        groups_ = std::make_shared<const GroupSnapshot>(parseGroup(readFile(sources_.group).value_or("")));
+        groups_ = std::make_shared<const GroupSnapshot>(parseGroup(readFile(sources_.group).valueOr("")));
         groupStamp_ = stamp;
     }
     return groups_;

@@ -41,10 +41,10 @@ bool isBlank(std::string_view text) {
     return text.find_first_not_of(" \t") == std::string_view::npos;
 }
 
-int writeSystemInformation(std::string_view key, std::string_view value) {
-    const StateLock lock;
+Result<> writeSystemInformation(std::string_view key, std::string_view value) {
+    const auto lock = StateLock::take();
     if (!lock)
-        return -1;
+        return lock.error();
     return perform(Effect::store, "system information",
                    [&] { return writeKeyValue(statePath(paths::systemInformation), key, value); });
 }
@@ -109,26 +109,28 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
     if (path == nullptr || key == nullptr || value == nullptr || size < 1)
         return velt::fail(velt::ErrorNumber::invalid, "There is no file, no key or no room for its value.");
     return velt::atBoundary([&] {
-        std::string text;
-        const int result = velt::readKeyValue(velt::statePath(path), key, text);
-        if (result > 0) {
-            // A NUL byte in the file ends the value for every reader of C strings; so it does here.
-            const auto length = std::min({text.size(), text.find('\0'), static_cast<std::size_t>(size - 1)});
-            std::memcpy(value, text.data(), length);
-            value[length] = '\0';
-        }
-        return result;
+        const auto found = velt::readKeyValue(velt::statePath(path), key);
+        if (!found)
+            return velt::fail(found.error());
+        if (!*found)
+            return 0;
+        // A NUL byte in the file ends the value for every reader of C strings; so it does here.
+        const std::string& text = **found;
+        const auto length = std::min({text.size(), text.find('\0'), static_cast<std::size_t>(size - 1)});
+        std::memcpy(value, text.data(), length);
+        value[length] = '\0';
+        return 1;
     });
 }
 
 int VLIBCINFOSetKeyValue(const char* key, const char* value) {
     if (key == nullptr || value == nullptr)
         return velt::fail(velt::ErrorNumber::invalid, "There is no key or no value to write.");
-    return velt::atBoundary([&] {
+    return velt::atBoundary([&]() -> int {
         // A blank stands for no address: whoever may not write an empty text can still take the address away.
         if (key == velt::externalAddressKey)
             return velt::toContract(velt::changeExternalAddress(velt::isBlank(value) ? "" : value));
-        return velt::writeSystemInformation(key, value);
+        return velt::toContract(velt::writeSystemInformation(key, value));
     });
 }
 

@@ -1,10 +1,10 @@
 #include "platform/service.h"
 
+#include "base/file.h"
 #include "platform/sftp.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -35,7 +35,8 @@ int setRunKey(const char* service, int value) {
             return fail(ErrorNumber::invalid,
                         "The run key " + std::to_string(value) + " is neither 1 nor 2.");
         }
-        return replaceFile(statePath(paths::runKeys) / service, std::to_string(value) + "\n", 0644);
+        return toContract(
+            replaceFile(statePath(paths::runKeys) / service, std::to_string(value) + "\n", 0644));
     });
 }
 

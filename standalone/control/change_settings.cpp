@@ -42,9 +42,9 @@ Result<> check(const SftpSettings& settings) {
 template<class Settings>
 Result<> changeStored(Result<Settings> (&load)(), const std::function<void(Settings&)>& change,
                       const std::function<Result<>(const Settings&)>& store) {
-    const StateLock lock;
+    const auto lock = StateLock::take();
     if (!lock)
-        return lastErrorAsValue();
+        return lock.error();
     Result<Settings> settings = load();
     if (!settings)
         return settings.error();
@@ -54,11 +54,9 @@ Result<> changeStored(Result<Settings> (&load)(), const std::function<void(Setti
 }
 
 Result<> storeExternalAddress(const FtpSettings& settings) {
-    return perform(Effect::store, "external address", [&]() -> Result<> {
-        if (writeKeyValue(statePath(paths::systemInformation), externalAddressKey, settings.externalAddress) <
-            0)
-            return lastErrorAsValue();
-        return {};
+    return perform(Effect::store, "external address", [&] {
+        return writeKeyValue(statePath(paths::systemInformation), externalAddressKey,
+                             settings.externalAddress);
     });
 }
 

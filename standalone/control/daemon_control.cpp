@@ -1,10 +1,11 @@
 #include "standalone/control/daemon_control.h"
 
+#include "base/file_lock.h"
 #include "base/unique_fd.h"
 #include "standalone/control/service_backend.h"
 #include "standalone/control/start_failure.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_lock.h"
 #include "standalone/core/last_error.h"
 #include "standalone/daemons/candidate.h"
 #include "standalone/firewall/firewall.h"
@@ -47,7 +48,7 @@ public:
                  "The lock " + file.string() + " cannot be had: " + std::strerror(errno) + ".");
             return;
         }
-        held_ = waitForFileLock(descriptor_.get(), file) >= 0;
+        held_ = toContract(waitForFileLock(descriptor_.get(), file)) >= 0;
     }
 
     explicit operator bool() const { return held_; }

@@ -1,6 +1,6 @@
 #include "standalone/control/start_failure.h"
 
-#include "standalone/core/file_store.h"
+#include "base/file.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -24,12 +24,13 @@ int noteOutcome(const std::string& daemon, int result) {
         return result;
     }
     const LastErrorKept kept;
-    replaceFile(noteFile(daemon), lastErrorSentence(), 0644);
+    static_cast<void>(replaceFile(noteFile(daemon), lastErrorSentence(), 0644));
     return result;
 }
 
 std::optional<std::string> startFailure(const std::string& daemon) {
-    return readFile(noteFile(daemon));
+    const auto note = readFile(noteFile(daemon));
+    return note ? std::optional(*note) : std::nullopt;
 }
 
 } // namespace velt

@@ -1,8 +1,7 @@
 #include "standalone/control/systemd_launcher.h"
 
+#include "base/file.h"
 #include "standalone/control/systemd_unit.h"
-#include "standalone/core/file_store.h"
-#include "standalone/core/last_error.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 #include "standalone/supervise/control_channel.h"
@@ -58,8 +57,8 @@ std::string SystemdLauncher::launch(const std::filesystem::path& directory, cons
 
 std::string SystemdLauncher::keep(const std::filesystem::path& directory, const DaemonPlan& plan) {
     const ControlRequest order{Command::start, {plan.configurationHash, plan.listenPorts, plan.arguments}};
-    return replaceFile(orderFile(directory, daemon_), encodeRequest(order), 0600) < 0 ? lastErrorSentence()
-                                                                                      : std::string();
+    const auto written = replaceFile(orderFile(directory, daemon_), encodeRequest(order), 0600);
+    return written ? std::string() : written.error().message;
 }
 
 /// systemd reads all its units again for new ones, which it need not do for those that are as they were.
@@ -70,8 +69,8 @@ std::string SystemdLauncher::writeUnits(const std::filesystem::path& directory) 
         if (readFile(file) == unit.text) {
             continue;
         }
-        if (replaceFile(file, unit.text, 0644) < 0) {
-            return lastErrorSentence();
+        if (const auto replaced = replaceFile(file, unit.text, 0644); !replaced) {
+            return replaced.error().message;
         }
         written = true;
     }

@@ -1,14 +1,11 @@
 #include "standalone/core/key_value_file.h"
 
-#include "standalone/core/file_store.h"
-#include "standalone/core/last_error.h"
+#include "base/file.h"
+#include "standalone/core/error_number.h"
 
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
-#include <optional>
 
 namespace velt {
 
@@ -55,16 +52,6 @@ std::optional<FoundLine> findKey(std::string_view contents, std::string_view key
     return found;
 }
 
-int readContents(const std::filesystem::path& file, std::string& contents) {
-    auto read = readFile(file);
-    if (!read && errno == ENOENT)
-        return 0;
-    if (!read)
-        return fail(ErrorNumber::store, "Cannot read " + file.string() + ": " + std::strerror(errno) + ".");
-    contents = std::move(*read);
-    return 1;
-}
-
 bool isControl(char byte) {
     const auto value = static_cast<unsigned char>(byte);
     return value < 0x20 || value == 0x7f;
@@ -75,18 +62,18 @@ bool isKeyByte(char byte) {
            byte == '_' || byte == '-' || byte == '.';
 }
 
-int checkKeyValue(std::string_view key, std::string_view value) {
+Result<> checkKeyValue(std::string_view key, std::string_view value) {
     if (key.empty() || !std::all_of(key.begin(), key.end(), isKeyByte))
-        return fail(ErrorNumber::invalid,
-                    "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.");
+        return Error(ErrorNumber::invalid,
+                     "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.");
     const std::string name(key);
     if (value.size() > longestValue)
-        return fail(ErrorNumber::invalid,
-                    "The value of " + name + " is longer than " + std::to_string(longestValue) + " bytes.");
+        return Error(ErrorNumber::invalid,
+                     "The value of " + name + " is longer than " + std::to_string(longestValue) + " bytes.");
     if (std::any_of(value.begin(), value.end(), isControl))
-        return fail(ErrorNumber::invalid,
-                    "The value of " + name + " contains a line end or another control byte.");
-    return 0;
+        return Error(ErrorNumber::invalid,
+                     "The value of " + name + " contains a line end or another control byte.");
+    return {};
 }
 
 mode_t modeOf(const std::filesystem::path& file) {
@@ -96,22 +83,23 @@ mode_t modeOf(const std::filesystem::path& file) {
 
 } // namespace
 
-int readKeyValue(const std::filesystem::path& file, std::string_view key, std::string& value) {
-    std::string contents;
-    const int read = readContents(file, contents);
-    if (read <= 0)
-        return read;
-    const auto found = findKey(contents, key);
-    if (!found)
-        return 0;
-    value = found->value;
-    return 1;
+Result<std::optional<std::string>> readKeyValue(const std::filesystem::path& file, std::string_view key) {
+    const auto contents = readOptionalFile(file);
+    if (!contents)
+        return contents.error();
+    if (!*contents)
+        return std::nullopt;
+    const auto found = findKey(**contents, key);
+    return found ? std::optional(std::string(found->value)) : std::nullopt;
 }
 
-int writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value) {
-    std::string contents;
-    if (checkKeyValue(key, value) < 0 || readContents(file, contents) < 0)
-        return -1;
+Result<> writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value) {
+    if (auto checked = checkKeyValue(key, value); !checked)
+        return checked;
+    const auto read = readOptionalFile(file);
+    if (!read)
+        return read.error();
+    std::string contents = read->value_or("");
     const std::string line = std::string(key) + '=' + quotedIfNeeded(value);
     if (const auto found = findKey(contents, key)) {
         contents.replace(found->begin, found->length, line);

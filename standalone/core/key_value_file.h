@@ -6,21 +6,23 @@
 #ifndef VELT_STANDALONE_CORE_KEY_VALUE_FILE_H
 #define VELT_STANDALONE_CORE_KEY_VALUE_FILE_H
 
+#include "base/result.h"
+
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <string_view>
 
 namespace velt {
 
-/// Reads the key's value. Positive when it is there, 0 when the key or the whole file is not, negative when
-/// the file cannot be read (last error set). Thread-safe.
-int readKeyValue(const std::filesystem::path& file, std::string_view key, std::string& value);
+/// The key's value; nothing when the key or the whole file is not there. Thread-safe.
+Result<std::optional<std::string>> readKeyValue(const std::filesystem::path& file, std::string_view key);
 
 /// Writes the key's value in the line where it stands, or in a new last line; all other bytes of the file
-/// stay, and so does its mode (a new file gets 0644). Refuses, with the last error set, a key other than
+/// stay, and so does its mode (a new file gets 0644). Refuses a key other than
 /// letters, digits, "_", "-" and ".", and a value with a control byte or of more than 4096 bytes. To be
 /// called under the StateLock.
-int writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value);
+Result<> writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value);
 
 } // namespace velt
 

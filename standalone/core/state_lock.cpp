@@ -1,15 +1,14 @@
 #include "standalone/core/state_lock.h"
 
+#include "base/file.h"
+#include "base/file_lock.h"
 #include "base/unique_fd.h"
-#include "standalone/core/file_lock.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <fcntl.h>
 
-#include <cerrno>
-#include <cstring>
 #include <system_error>
 
 namespace velt {
@@ -28,34 +27,40 @@ ThreadLock& threadLock() {
     return lock;
 }
 
-int failToLock(const std::filesystem::path& path, const std::string& why,
-               SourcePlace where = SourcePlace::current()) {
-    return fail(ErrorNumber::store, "Cannot lock " + path.string() + ": " + why + ".", where);
-}
-
-int openAndLock(UniqueFd& file) {
+Result<UniqueFd> openAndLock() {
     const auto path = statePath(paths::stateLock);
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
     if (error)
-        return failToLock(path, error.message());
-    UniqueFd opened(::open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
-    if (!opened)
-        return failToLock(path, std::strerror(errno));
-    if (waitForFileLock(opened.get(), path) < 0)
-        return -1;
-    file = std::move(opened);
-    return 0;
+        return cannot("lock", path, error.value());
+    UniqueFd file(::open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
+    if (!file)
+        return cannot("lock", path);
+    if (auto locked = waitForFileLock(file.get(), path); !locked)
+        return locked.error();
+    return file;
 }
 
 } // namespace
 
-StateLock::StateLock() {
+Result<StateLock> StateLock::take() {
     ThreadLock& lock = threadLock();
-    if (lock.depth == 0 && openAndLock(lock.file) < 0)
-        return;
+    if (lock.depth == 0) {
+        auto file = openAndLock();
+        if (!file)
+            return file.error();
+        lock.file = std::move(*file);
+    }
     ++lock.depth;
-    held_ = true;
+    return StateLock(true);
+}
+
+StateLock::StateLock() {
+    auto lock = take();
+    if (lock)
+        held_ = std::exchange(lock->held_, false);
+    else
+        fail(lock.error());
 }
 
 StateLock::~StateLock() {

@@ -2,21 +2,30 @@
 #ifndef VELT_STANDALONE_CORE_STATE_LOCK_H
 #define VELT_STANDALONE_CORE_STATE_LOCK_H
 
+#include "base/result.h"
+
+#include <utility>
+
 namespace velt {
 
 /// Holds the lock of the state root, across threads and processes, while it lives. Read-modify-write
-/// of a stored file happens under it. A thread that holds it may take it again.
+/// of a stored file happens under it. A thread that holds it may take it again. Stays on its thread.
 class StateLock {
 public:
+    static Result<StateLock> take();
+
+    /// As take; with the last error set when the lock cannot be had.
     StateLock();
     ~StateLock();
-    StateLock(const StateLock&) = delete;
-    StateLock& operator=(const StateLock&) = delete;
+    StateLock(StateLock&& other) noexcept : held_(std::exchange(other.held_, false)) {}
+    StateLock& operator=(StateLock&&) = delete;
 
     /// False when the lock cannot be had (the last error says why).
     explicit operator bool() const { return held_; }
 
 private:
+    explicit StateLock(bool held) : held_(held) {}
+
     bool held_ = false;
 };
 

@@ -1,12 +1,10 @@
 #include "standalone/core/strict_file.h"
 
+#include "base/file.h"
 #include "standalone/core/error_number.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/quoted_text.h"
 
-#include <cerrno>
 #include <charconv>
-#include <cstring>
 
 namespace velt {
 
@@ -51,11 +49,10 @@ std::string numberText(std::int64_t least, std::int64_t most) {
 }
 
 Result<StrictFile> StrictFile::load(const std::filesystem::path& path, FileVersions versions) {
-    if (const auto contents = readFile(path))
-        return parse(path.string(), *contents, versions);
-    if (errno == ENOENT)
-        return StrictFile(path.string());
-    return Error(ErrorNumber::store, "Cannot read " + path.string() + ": " + std::strerror(errno) + ".");
+    const auto contents = readOptionalFile(path);
+    if (!contents)
+        return contents.error();
+    return *contents ? parse(path.string(), **contents, versions) : StrictFile(path.string());
 }
 
 Result<StrictFile> StrictFile::parse(std::string name, std::string_view contents, FileVersions versions) {

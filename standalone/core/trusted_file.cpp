@@ -1,7 +1,7 @@
 #include "standalone/core/trusted_file.h"
 
 #include "base/unique_fd.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -15,14 +15,13 @@ namespace {
 
 constexpr off_t longestFile = off_t{16} << 20;
 
-std::optional<std::string> refuse(const std::filesystem::path& path, const std::string& why) {
-    fail(ErrorNumber::store, "The file " + path.string() + " " + why + ".");
-    return std::nullopt;
+Error refuse(const std::filesystem::path& path, const std::string& why) {
+    return {ErrorNumber::store, "The file " + path.string() + " " + why + "."};
 }
 
 } // namespace
 
-std::optional<std::string> readTrusted(const std::filesystem::path& path) {
+Result<std::string> readTrusted(const std::filesystem::path& path) {
     const UniqueFd file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     struct stat facts {};
     if (!file || fstat(file.get(), &facts) < 0) {

@@ -2,16 +2,16 @@
 #ifndef VELT_STANDALONE_CORE_TRUSTED_FILE_H
 #define VELT_STANDALONE_CORE_TRUSTED_FILE_H
 
+#include "base/result.h"
+
 #include <filesystem>
-#include <optional>
 #include <string>
 
 namespace velt {
 
 /// The whole file. It must be a regular file of at most 16 MiB that belongs to root, or to whom this process
-/// belongs, and that nobody else may write. Nothing, with the last error set, when it is not, is missing, or
-/// cannot be read.
-std::optional<std::string> readTrusted(const std::filesystem::path& path);
+/// belongs, and that nobody else may write. A missing one is an error.
+Result<std::string> readTrusted(const std::filesystem::path& path);
 
 } // namespace velt
 

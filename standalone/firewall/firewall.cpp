@@ -1,6 +1,7 @@
 #include "standalone/firewall/firewall.h"
 
-#include "standalone/core/file_store.h"
+#include "base/file.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
@@ -59,8 +60,8 @@ void warnOfForeignTables() {
     }
     ::syslog(LOG_WARNING, "%s", firstLine(text).c_str());
     // The rules are in force by now: a note that cannot be left is no reason to call them failed.
-    if (replaceFile(warningFile(), text, 0644) < 0) {
-        ::syslog(LOG_WARNING, "%s", lastErrorSentence().c_str());
+    if (const auto noted = replaceFile(warningFile(), text, 0644); !noted) {
+        ::syslog(LOG_WARNING, "%s", noted.error().message.c_str());
     }
 }
 
@@ -88,7 +89,7 @@ int replaceRules(const std::string& script) {
         return 0;
     }
     // Noted before it is done, since a note without rules does no harm.
-    if (noteLoading() < 0) {
+    if (toContract(noteLoading()) < 0) {
         return -1;
     }
     const auto before = rulesetGeneration();

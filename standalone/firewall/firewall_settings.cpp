@@ -1,6 +1,6 @@
 #include "standalone/firewall/firewall_settings.h"
 
-#include "standalone/core/file_store.h"
+#include "base/file.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -106,17 +106,12 @@ std::optional<FirewallSettings> parseFirewallSettings(std::string_view text, con
 
 std::optional<FirewallSettings> loadFirewallSettings() {
     const std::filesystem::path file = statePath(paths::firewallSettings);
-    errno = 0;
-    const auto text = readFile(file);
-    if (text) {
-        return parseFirewallSettings(*text, file.string());
-    }
-    if (errno != ENOENT) {
-        fail(ErrorNumber::store,
-             "Settings file " + file.string() + " cannot be read: " + std::strerror(errno) + ".");
+    const auto text = readOptionalFile(file);
+    if (!text) {
+        fail(text.error());
         return std::nullopt;
     }
-    return FirewallSettings{};
+    return *text ? parseFirewallSettings(**text, file.string()) : FirewallSettings{};
 }
 
 } // namespace velt

@@ -1,7 +1,6 @@
 #include "standalone/firewall/loaded_rules.h"
 
-#include "standalone/core/file_store.h"
-#include "standalone/core/last_error.h"
+#include "base/file.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
@@ -43,7 +42,7 @@ bool rulesAreInForce(std::string_view script) {
     return generation && readFile(noteFile()) == note(*generation, script);
 }
 
-int noteLoading() {
+Result<> noteLoading() {
     return replaceFile(noteFile(), bootId(), 0644);
 }
 
@@ -52,9 +51,8 @@ void noteLoaded(std::string_view script, std::optional<std::uint32_t> before) {
     if (!before || !now || *now != *before + 1) {
         return; // the note of the loading stands
     }
-    const LastErrorKept kept;
-    if (replaceFile(noteFile(), note(*now, script), 0644) < 0) {
-        ::syslog(LOG_WARNING, "%s", lastErrorSentence().c_str());
+    if (const auto noted = replaceFile(noteFile(), note(*now, script), 0644); !noted) {
+        ::syslog(LOG_WARNING, "%s", noted.error().message.c_str());
     }
 }
 

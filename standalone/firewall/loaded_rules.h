@@ -3,6 +3,8 @@
 #ifndef VELT_STANDALONE_FIREWALL_LOADED_RULES_H
 #define VELT_STANDALONE_FIREWALL_LOADED_RULES_H
 
+#include "base/result.h"
+
 #include <cstdint>
 #include <optional>
 #include <string_view>
@@ -17,8 +19,8 @@ bool rulesWereLoaded();
 /// changed any rule of this network since.
 bool rulesAreInForce(std::string_view script);
 
-/// Notes that rules are about to be loaded. Negative on failure, with the last error set.
-int noteLoading();
+/// Notes that rules are about to be loaded.
+Result<> noteLoading();
 
 /// Notes that the script was loaded. `before` is the ruleset's generation of before that: when somebody else
 /// made a change in between, the rules count as loaded, but not as in force.

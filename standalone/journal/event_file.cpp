@@ -1,7 +1,7 @@
 #include "standalone/journal/event_file.h"
 
+#include "base/file.h"
 #include "base/unique_fd.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"

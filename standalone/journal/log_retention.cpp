@@ -1,14 +1,12 @@
 #include "standalone/journal/log_retention.h"
 
+#include "base/file.h"
 #include "base/plain_text.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
-#include <cerrno>
 #include <charconv>
-#include <cstring>
 
 namespace velt {
 
@@ -73,16 +71,16 @@ std::optional<LogRetention> parseRetention(std::string_view text, std::string& f
 
 std::optional<LogRetention> loadRetention() {
     const std::filesystem::path path = statePath(paths::logRetention);
-    const std::optional<std::string> text = readFile(path);
-    if (!text && errno == ENOENT) {
-        return LogRetention{};
-    }
+    const auto text = readOptionalFile(path);
     if (!text) {
-        fail(ErrorNumber::store, path.string() + " cannot be read: " + std::strerror(errno) + ".");
+        fail(text.error());
         return std::nullopt;
     }
+    if (!*text) {
+        return LogRetention{};
+    }
     std::string flaw;
-    std::optional<LogRetention> retention = parseRetention(*text, flaw);
+    std::optional<LogRetention> retention = parseRetention(**text, flaw);
     if (!retention) {
         fail(ErrorNumber::damaged, path.string() + " is damaged: " + flaw + ".");
     }

@@ -32,6 +32,7 @@ std::optional<std::vector<ShareEntry>> readShares() {
     }
     const auto text = readTrusted(path);
     if (!text) {
+        fail(text.error());
         return std::nullopt;
     }
     std::string flaw;
@@ -45,7 +46,11 @@ std::optional<std::vector<ShareEntry>> readShares() {
 /// The path of the rule that applies, "" for none.
 std::optional<std::string> readRule(const Login& login) {
     const auto text = readTrusted(statePath(paths::chrootRules));
-    const auto rules = text ? parseRules(*text) : std::nullopt;
+    if (!text) {
+        fail(text.error());
+        return std::nullopt;
+    }
+    const auto rules = parseRules(*text);
     if (!rules) {
         return std::nullopt;
     }

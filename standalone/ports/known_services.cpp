@@ -1,13 +1,11 @@
 #include "standalone/ports/known_services.h"
 
-#include "standalone/core/file_store.h"
+#include "base/file.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/ports/port_range.h"
 
-#include <cerrno>
-#include <cstring>
 #include <sstream>
 
 namespace velt {
@@ -39,17 +37,13 @@ std::optional<std::vector<KnownService>> parseKnownServices(std::string_view tex
 
 std::optional<std::vector<KnownService>> loadKnownServices() {
     const std::filesystem::path file = statePath(paths::knownServices);
-    errno = 0;
-    const auto text = readFile(file);
-    if (text) {
-        return parseKnownServices(*text, file.string());
-    }
-    if (errno != ENOENT) {
-        fail(ErrorNumber::store,
-             "Settings file " + file.string() + " cannot be read: " + std::strerror(errno) + ".");
+    const auto text = readOptionalFile(file);
+    if (!text) {
+        fail(text.error());
         return std::nullopt;
     }
-    return parseKnownServices(shippedKnownServices, "known_services.conf, as shipped");
+    return *text ? parseKnownServices(**text, file.string())
+                 : parseKnownServices(shippedKnownServices, "known_services.conf, as shipped");
 }
 
 } // namespace velt

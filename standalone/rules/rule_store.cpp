@@ -1,16 +1,15 @@
 #include "standalone/rules/rule_store.h"
 
+#include "base/file.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <charconv>
-#include <cstring>
 
 namespace velt {
 namespace {
@@ -94,16 +93,12 @@ std::optional<std::vector<ChrootRule>> parseRules(std::string_view text) {
 }
 
 std::optional<std::vector<ChrootRule>> loadRules() {
-    const auto text = readFile(rulesFile());
-    if (text) {
-        return parseRules(*text);
+    const auto text = readOptionalFile(rulesFile());
+    if (!text) {
+        fail(text.error());
+        return std::nullopt;
     }
-    if (errno == ENOENT) {
-        return std::vector<ChrootRule>();
-    }
-    fail(ErrorNumber::store,
-         "The file " + rulesFile().string() + " cannot be read: " + std::strerror(errno) + ".");
-    return std::nullopt;
+    return *text ? parseRules(**text) : std::vector<ChrootRule>();
 }
 
 int saveRules(const std::vector<ChrootRule>& rules) {
@@ -117,7 +112,8 @@ int saveRules(const std::vector<ChrootRule>& rules) {
     if (!lock) {
         return -1;
     }
-    return perform(Effect::store, "chroot rules", [&text] { return replaceFile(rulesFile(), text, 0600); });
+    return toContract(
+        perform(Effect::store, "chroot rules", [&text] { return replaceFile(rulesFile(), text, 0600); }));
 }
 
 int makeRulesFile() {

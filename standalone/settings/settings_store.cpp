@@ -1,10 +1,10 @@
 #include "standalone/settings/settings_store.h"
 
+#include "base/file.h"
 #include "base/ipv4.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/key_value_file.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -12,7 +12,6 @@
 
 #include <unistd.h>
 
-#include <cerrno>
 #include <cstring>
 
 namespace velt {
@@ -27,19 +26,15 @@ using Parse = Result<Settings> (*)(const std::string& name, std::string_view con
 template<class Settings>
 Result<Settings> loadFile(std::string_view name, Parse<Settings> parse, const Settings& defaults) {
     const auto path = statePath(name);
-    if (const auto contents = readFile(path))
-        return parse(path.string(), *contents);
-    if (errno == ENOENT)
-        return defaults;
-    return Error(ErrorNumber::store, "Cannot read " + path.string() + ": " + std::strerror(errno) + ".");
+    const auto contents = readOptionalFile(path);
+    if (!contents)
+        return contents.error();
+    return *contents ? parse(path.string(), **contents) : defaults;
 }
 
 Result<> storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
-    return perform(Effect::store, subject, [&]() -> Result<> {
-        if (replaceFile(statePath(name), contents, settingsMode) < 0)
-            return lastErrorAsValue();
-        return {};
-    });
+    return perform(Effect::store, subject,
+                   [&] { return replaceFile(statePath(name), contents, settingsMode); });
 }
 
 bool isMissing(std::string_view name) {
@@ -64,8 +59,10 @@ Result<FtpSettings> loadFtpSettings() {
     if (!settings)
         return settings;
     const auto file = statePath(paths::systemInformation);
-    if (readKeyValue(file, externalAddressKey, settings->externalAddress) < 0)
-        return lastErrorAsValue();
+    const auto address = readKeyValue(file, externalAddressKey);
+    if (!address)
+        return address.error();
+    settings->externalAddress = address->value_or("");
     if (!settings->externalAddress.empty() && !parseIPv4(settings->externalAddress))
         return Error(ErrorNumber::damaged,
                      "File " + file.string() + ": the value of ftp_ext_ip is no IPv4 address.");
@@ -85,9 +82,9 @@ Result<> storeSftpSettings(const SftpSettings& settings) {
 }
 
 Result<> writeMissingSettings() {
-    const StateLock lock;
+    const auto lock = StateLock::take();
     if (!lock)
-        return lastErrorAsValue();
+        return lock.error();
     if (isMissing(paths::ftpSettings))
         if (Result<> stored = storeFtpSettings(defaultFtpSettings()); !stored)
             return stored;

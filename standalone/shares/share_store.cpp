@@ -1,16 +1,15 @@
 #include "standalone/shares/share_store.h"
 
+#include "base/file.h"
 #include "base/file_stamp.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_file.h"
 
-#include <cerrno>
-#include <cstring>
 #include <mutex>
 
 namespace velt {
@@ -31,16 +30,16 @@ Cache& cache() {
 }
 
 std::optional<std::vector<ShareEntry>> readShares(const std::filesystem::path& path) {
-    const std::optional<std::string> text = readFile(path);
-    if (!text && errno == ENOENT) {
-        return std::vector<ShareEntry>{};
-    }
+    const auto text = readOptionalFile(path);
     if (!text) {
-        fail(ErrorNumber::store, path.string() + " cannot be read: " + std::strerror(errno) + ".");
+        fail(text.error());
         return std::nullopt;
     }
+    if (!*text) {
+        return std::vector<ShareEntry>{};
+    }
     std::string flaw;
-    std::optional<std::vector<ShareEntry>> shares = parseShares(*text, flaw);
+    std::optional<std::vector<ShareEntry>> shares = parseShares(**text, flaw);
     if (!shares) {
         fail(ErrorNumber::damaged, path.string() + " is damaged: " + flaw + ".");
     }
@@ -74,8 +73,9 @@ int saveShares(const std::vector<ShareEntry>& shares) {
     if (!lock) {
         return -1;
     }
-    return perform(Effect::store, "shares",
-                   [&shares] { return replaceFile(statePath(paths::shares), renderShares(shares), 0644); });
+    return toContract(perform(Effect::store, "shares", [&shares] {
+        return replaceFile(statePath(paths::shares), renderShares(shares), 0644);
+    }));
 }
 
 } // namespace velt

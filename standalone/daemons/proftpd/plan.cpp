@@ -1,8 +1,8 @@
 #include "standalone/daemons/daemon_plan.h"
 
+#include "base/file.h"
 #include "base/sha256.h"
 #include "standalone/core/boundary.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/daemons/candidate.h"
@@ -24,7 +24,7 @@ int testRendering(const FtpSettings& settings, ProftpdPlaces places) {
     }
     places.runFolder = scratch.path();
     const auto configuration = scratch.path() / "proftpd.conf";
-    if (replaceFile(configuration, renderProftpd(settings, places), 0600) < 0) {
+    if (toContract(replaceFile(configuration, renderProftpd(settings, places), 0600)) < 0) {
         return -1;
     }
     return runDaemonTest("FTP", {program, "-t", "-c", configuration.string()});
@@ -62,7 +62,7 @@ int writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) 
         return -1;
     }
     return confinesAnonymous(settings)
-               ? replaceFile(places.anonymousShare, settings.record.anonymous_chroot_share, 0600)
+               ? toContract(replaceFile(places.anonymousShare, settings.record.anonymous_chroot_share, 0600))
                : 0;
 }
 
@@ -73,7 +73,7 @@ std::optional<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings
     found.places.anonymousShare = plan.folder / "anonymous";
     const auto configuration = plan.folder / "proftpd.conf";
     if (writeSurroundings(settings, found.places) < 0 ||
-        replaceFile(configuration, renderProftpd(settings, found.places), 0600) < 0) {
+        toContract(replaceFile(configuration, renderProftpd(settings, found.places), 0600)) < 0) {
         return std::nullopt;
     }
     // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.

@@ -1,7 +1,8 @@
 #include "standalone/daemons/sshd/host_keys.h"
 
+#include "base/file.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
@@ -32,16 +33,14 @@ int makeKey(const std::string& kind, const std::filesystem::path& place) {
     const auto result =
         runProcess({"/usr/bin/ssh-keygen", "-q", "-t", kind, "-N", "", "-C", "", "-f", made.string()}, {},
                    std::chrono::seconds(60));
-    const auto key = result.exitCode == 0 ? readFile(made) : std::nullopt;
-    const auto publicKey = key ? readFile(made.string() + ".pub") : std::nullopt;
-    if (!publicKey) {
+    const auto key = readFile(made);
+    const auto publicKey = readFile(made.string() + ".pub");
+    if (result.exitCode != 0 || !key || !publicKey) {
         return fail(ErrorNumber::daemon,
                     "No host key can be made for SFTP: " + lastWords(result.errors) + ".");
     }
-    if (replaceFile(place.string() + ".pub", *publicKey, 0644) < 0) {
-        return -1;
-    }
-    return replaceFile(place, *key, 0600);
+    const auto stored = replaceFile(place.string() + ".pub", *publicKey, 0644);
+    return toContract(stored ? replaceFile(place, *key, 0600) : stored);
 }
 
 std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {

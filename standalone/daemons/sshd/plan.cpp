@@ -1,6 +1,6 @@
+#include "base/file.h"
 #include "base/sha256.h"
 #include "standalone/core/boundary.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
@@ -55,7 +55,7 @@ std::optional<std::string> rendering(const SftpSettings& settings) {
 int testRendering(const std::string& text) {
     const ScratchFolder scratch;
     const auto configuration = scratch.path() / "sshd_config";
-    if (!scratch || replaceFile(configuration, text, 0600) < 0) {
+    if (!scratch || toContract(replaceFile(configuration, text, 0600)) < 0) {
         return -1;
     }
     return runDaemonTest("SFTP", {program, "-t", "-f", configuration.string()});
@@ -82,7 +82,7 @@ std::optional<DaemonPlan> planSftpDaemon() {
     plan.configurationHash = sha256(*text);
     plan.folder = statePath(paths::sftpConfigurations) / plan.configurationHash;
     const auto configuration = plan.folder / "sshd_config";
-    if (replaceFile(configuration, *text, 0600) < 0) {
+    if (toContract(replaceFile(configuration, *text, 0600)) < 0) {
         return std::nullopt;
     }
     plan.arguments = {program, "-D", "-e", "-f", configuration.string()};

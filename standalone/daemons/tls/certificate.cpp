@@ -1,8 +1,9 @@
 #include "standalone/daemons/tls/certificate.h"
 
+#include "base/file.h"
 #include "base/sha256.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
@@ -94,10 +95,8 @@ int makeOwn(const Pair& pair) {
         ERR_clear_error();
         return fail(ErrorNumber::daemon, "The OpenSSL library cannot make a certificate for this server.");
     }
-    if (replaceFile(pair.key, made->key, 0600) < 0) {
-        return -1;
-    }
-    return replaceFile(pair.certificate, made->certificate, 0644);
+    const auto stored = replaceFile(pair.key, made->key, 0600);
+    return toContract(stored ? replaceFile(pair.certificate, made->certificate, 0644) : stored);
 }
 
 // Something has to stand in the configuration that a daemon is to test, also where nothing may be stored.

@@ -1,11 +1,11 @@
 // The port test: what the FTP and SFTP settings may not take.
 
+#include "base/file.h"
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
 #include "platform/webapi.h"
 #include "standalone/control/services.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
@@ -136,13 +136,13 @@ TEST_F(PortConflictTest, KnownServicesKeepTheirPorts) {
 
 TEST_F(PortConflictTest, TheListOfKnownServicesIsTheAdministrators) {
     const auto file = statePath("/etc/velt/known_services.conf");
-    ASSERT_EQ(replaceFile(file, "# ours\n\n45000-45002 backup # nightly\n  45010\tssh\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(file, "# ours\n\n45000-45002 backup # nightly\n  45010\tssh\n", 0644));
     expectConflict("ftp", 45002, 45002, 45002, "the service backup of this server");
     expectConflict("ftp", 45010, 45010, 45010, "the service ssh of this server");
     expectNoConflict("ssh", 45010, 45010);
     for (const char* line : {"45000", "x backup", "0 backup", "45000-44000 backup", "65536 backup",
                              "1 two words", "45000- backup", "-5 backup"}) {
-        ASSERT_EQ(replaceFile(file, std::string("45010 good\n") + line + "\n", 0644), 0);
+        ASSERT_TRUE(replaceFile(file, std::string("45010 good\n") + line + "\n", 0644));
         EXPECT_NE(IsPortConflict("ftp", 46000, 46000), 0) << line;
         EXPECT_NE(lastErrorSentence().find("known_services.conf, line 2: "), std::string::npos)
             << lastErrorSentence();
@@ -150,7 +150,7 @@ TEST_F(PortConflictTest, TheListOfKnownServicesIsTheAdministrators) {
 }
 
 TEST_F(PortConflictTest, DamagedSettingsAreNoPermission) {
-    ASSERT_EQ(replaceFile(statePath("/etc/velt/sftp.conf"), "nonsense\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/etc/velt/sftp.conf"), "nonsense\n", 0644));
     EXPECT_NE(IsPortConflict("ftp", 46000, 46000), 0);
     EXPECT_NE(lastErrorSentence().find("sftp.conf"), std::string::npos) << lastErrorSentence();
 }

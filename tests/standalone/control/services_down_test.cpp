@@ -101,9 +101,9 @@ TEST_F(ServicesDownTest, RestartsAreCountedByDaemon) {
 TEST_F(ServicesDownTest, DamagedSettingsAreListedSinceNobodyKnowsWhatTheySay) {
     storeSftp(true);
     ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
-    ASSERT_EQ(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644));
     ASSERT_EQ(VLIBServicectlStop("ftpd", 0), 0);
-    ASSERT_EQ(replaceFile(statePath("/etc/velt/sftp.conf"), "nonsense\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/etc/velt/sftp.conf"), "nonsense\n", 0644));
     const Down down = servicesDown();
     ASSERT_EQ(down.size(), 2U);
     EXPECT_NE(down[0].reason.find("ftp.conf, line 1"), std::string::npos) << down[0].reason;
@@ -114,7 +114,7 @@ TEST_F(ServicesDownTest, DamagedSettingsAreListedSinceNobodyKnowsWhatTheySay) {
 
 TEST_F(ServicesDownTest, DamagedSettingsOfOneServiceDoNotKeepTheOtherDown) {
     storeSftp(true);
-    ASSERT_EQ(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644));
     EXPECT_LT(startEnabledServices(), 0);
     EXPECT_NE(lastErrorSentence().find("ftp.conf"), std::string::npos) << lastErrorSentence();
     EXPECT_TRUE(accepts(sftpPort_));
@@ -122,7 +122,7 @@ TEST_F(ServicesDownTest, DamagedSettingsOfOneServiceDoNotKeepTheOtherDown) {
 
 TEST_F(ServicesDownTest, LeavesTheLastErrorAlone) {
     fail(ErrorNumber::portTaken, "Something else.");
-    ASSERT_EQ(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644));
     EXPECT_EQ(servicesDown().size(), 1U);
     EXPECT_EQ(lastErrorSentence(), "Something else.");
     EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::portTaken));

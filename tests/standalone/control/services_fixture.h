@@ -2,12 +2,12 @@
 #ifndef VELT_TESTS_STANDALONE_CONTROL_SERVICES_FIXTURE_H
 #define VELT_TESTS_STANDALONE_CONTROL_SERVICES_FIXTURE_H
 
+#include "base/file.h"
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
 #include "standalone/control/services.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/control/plan_double.h"
@@ -26,7 +26,7 @@ protected:
     void SetUp() override {
         DaemonTest::SetUp();
         planDouble() = {};
-        ASSERT_EQ(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\nmode = off\n", 0644), 0);
+        ASSERT_TRUE(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\nmode = off\n", 0644));
         storeFtp(plain);
         storeSftp(false);
     }
@@ -53,7 +53,7 @@ protected:
 
     static ProcessId daemonOf(const std::string& service) { return serviceState(service).daemon; }
     static std::string runKey(const std::string& service) {
-        return readFile(statePath("/etc/velt/run-keys/" + service)).value_or("none");
+        return readFile(statePath("/etc/velt/run-keys/" + service)).valueOr("none");
     }
 
     int ftpPort_ = freePort();

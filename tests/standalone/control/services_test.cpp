@@ -169,7 +169,7 @@ TEST_F(ServicesTest, ARefusedConfigurationLeavesTheDaemonAlone) {
 }
 
 TEST_F(ServicesTest, DamagedSettingsStartNothing) {
-    ASSERT_EQ(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/etc/velt/ftp.conf"), "nonsense\n", 0644));
     EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
     EXPECT_NE(lastErrorSentence().find("ftp.conf"), std::string::npos) << lastErrorSentence();
     EXPECT_EQ(VLIBServiceIsEnabled("ftpd"), 0);

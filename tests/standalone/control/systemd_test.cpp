@@ -1,10 +1,10 @@
 // The units for systemd as text, and the conversation with systemctl. The program that answers here is a
 // stand-in, which starts and ends real supervisors.
 
+#include "base/file.h"
 #include "standalone/control/supervise_backend.h"
 #include "standalone/control/systemd_launcher.h"
 #include "standalone/control/systemd_unit.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/installed_files.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
@@ -65,7 +65,7 @@ esac
         std::filesystem::permissions(places_.systemctl, std::filesystem::perms::owner_all);
     }
 
-    std::string calls() const { return readFile(root_ / "calls").value_or(""); }
+    std::string calls() const { return readFile(root_ / "calls").valueOr(""); }
     void forgetCalls() const { std::filesystem::remove(root_ / "calls"); }
 
     void start(const std::string& hash) {

@@ -3,6 +3,7 @@
 #include "platform/core.h"
 #include "standalone/core/last_error.h"
 #include "tests/standalone/support/state_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -78,16 +79,16 @@ TEST_F(KeyValueFile, DoesNotLeaveTheStateRoot) {
 TEST_F(KeyValueFile, AWriteLeavesAllElseAsItStands) {
     const std::string before = "# Comment with key=old\n\n unknown = 1\nkey = old\n[section]\r\ntail=x";
     root_.write("etc/info.conf", before);
-    ASSERT_EQ(writeKeyValue(file_, "key", "new"), 0);
+    ASSERT_TRUE(writeKeyValue(file_, "key", "new"));
     EXPECT_EQ(contents(), "# Comment with key=old\n\n unknown = 1\nkey=new\n[section]\r\ntail=x");
-    ASSERT_EQ(writeKeyValue(file_, "added", "y"), 0);
+    ASSERT_TRUE(writeKeyValue(file_, "added", "y"));
     EXPECT_EQ(contents(), "# Comment with key=old\n\n unknown = 1\nkey=new\n[section]\r\ntail=x\nadded=y\n");
 }
 
 TEST_F(KeyValueFile, AWriteKeepsTheMode) {
     root_.write("etc/info.conf", "key=old\n");
     ASSERT_EQ(::chmod(file_.c_str(), 0600), 0);
-    ASSERT_EQ(writeKeyValue(file_, "key", "new"), 0);
+    ASSERT_TRUE(writeKeyValue(file_, "key", "new"));
     struct stat status {};
     ASSERT_EQ(::stat(file_.c_str(), &status), 0);
     EXPECT_EQ(status.st_mode & 0777, 0600U);
@@ -96,28 +97,28 @@ TEST_F(KeyValueFile, AWriteKeepsTheMode) {
 TEST_F(KeyValueFile, WhatIsWrittenIsRead) {
     for (const char* value : {"", "plain", " blanks around ", "\"quoted\"", "\"", "\"\"", "#hash", "a=b",
                               "-x", "../x", "%{env:HOME}", "$(id)", "\\", "\xc3\xa9", "\xff\xfe"}) {
-        ASSERT_EQ(writeKeyValue(file_, "key", value), 0) << value;
+        ASSERT_TRUE(writeKeyValue(file_, "key", value)) << value;
         EXPECT_EQ(read("key"), value);
     }
 }
 
 TEST_F(KeyValueFile, RefusesAValueThatWouldNotStayInItsLine) {
-    ASSERT_EQ(writeKeyValue(file_, "key", "old"), 0);
+    ASSERT_TRUE(writeKeyValue(file_, "key", "old"));
     for (const std::string value : {"a\nother=1", "a\rb", "a\tb", "\x01", "\x7f"}) {
-        EXPECT_LT(writeKeyValue(file_, "key", value), 0);
-        EXPECT_EQ(lastErrorSentence(), "The value of key contains a line end or another control byte.");
+        EXPECT_EQ(test::messageOf(writeKeyValue(file_, "key", value)),
+                  "The value of key contains a line end or another control byte.");
     }
-    EXPECT_LT(writeKeyValue(file_, "key", std::string_view("a\0b", 3)), 0);
-    EXPECT_LT(writeKeyValue(file_, "key", std::string(4097, 'x')), 0);
-    EXPECT_EQ(lastErrorSentence(), "The value of key is longer than 4096 bytes.");
+    EXPECT_FALSE(writeKeyValue(file_, "key", std::string_view("a\0b", 3)));
+    EXPECT_EQ(test::messageOf(writeKeyValue(file_, "key", std::string(4097, 'x'))),
+              "The value of key is longer than 4096 bytes.");
     EXPECT_EQ(contents(), "key=old\n");
 }
 
 TEST_F(KeyValueFile, RefusesAKeyThatIsNone) {
     for (const char* key : {"", "a b", "a=b", "#a", "a\n", "\"a\"", "[a]", "\xc3\xa9"}) {
-        EXPECT_LT(writeKeyValue(file_, key, "x"), 0) << key;
-        EXPECT_EQ(lastErrorSentence(),
-                  "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.");
+        EXPECT_EQ(test::messageOf(writeKeyValue(file_, key, "x")),
+                  "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.")
+            << key;
     }
     EXPECT_FALSE(std::filesystem::exists(file_));
 }

@@ -19,6 +19,12 @@ TEST(LastError, NamesNumberPlaceAndSentence) {
     EXPECT_EQ(lastErrorSentence(), "The file is damaged.");
 }
 
+TEST(LastError, WithoutANumberIsOneOfTheStore) {
+    fail(Error("Cannot read /x: Is a directory."));
+    EXPECT_EQ(VLIBCErrGet(), 0x0300);
+    EXPECT_EQ(lastErrorSentence(), "Cannot read /x: Is a directory.");
+}
+
 TEST(LastError, IsForgottenOnRequest) {
     fail(ErrorNumber::invalid, "Something is wrong.");
     clearLastError();

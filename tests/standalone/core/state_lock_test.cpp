@@ -1,9 +1,9 @@
+#include "base/file.h"
+#include "base/file_lock.h"
 #include "base/unique_fd.h"
-#include "standalone/core/file_lock.h"
-#include "standalone/core/file_store.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
 #include "tests/standalone/support/state_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
@@ -26,22 +26,22 @@ protected:
 
     // Reads, adds one, writes: loses updates unless the lock holds.
     bool addOne() const {
-        const StateLock lock;
+        const auto lock = StateLock::take();
         if (!lock)
             return false;
-        const int count = std::stoi(readFile(counter_).value_or("0"));
-        return replaceFile(counter_, std::to_string(count + 1), 0644) == 0;
+        const int count = std::stoi(readFile(counter_).valueOr("0"));
+        return bool(replaceFile(counter_, std::to_string(count + 1), 0644));
     }
 };
 
 TEST_F(Lock, MayBeTakenAgainByItsThread) {
-    const StateLock outer;
+    const auto outer = StateLock::take();
     ASSERT_TRUE(outer);
     {
-        const StateLock inner;
+        const auto inner = StateLock::take();
         EXPECT_TRUE(inner);
     }
-    const StateLock again;
+    const auto again = StateLock::take();
     EXPECT_TRUE(again);
 }
 
@@ -50,9 +50,8 @@ TEST_F(Lock, OfAFileIsNotWaitedForForEver) {
     const auto openFile = [&] { return UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600)); };
     const UniqueFd holder = openFile();
     const UniqueFd waiter = openFile();
-    ASSERT_EQ(waitForFileLock(holder.get(), file), 0) << lastErrorSentence();
-    EXPECT_LT(waitForFileLock(waiter.get(), file, std::chrono::milliseconds(50)), 0);
-    EXPECT_EQ(lastErrorSentence(),
+    ASSERT_TRUE(waitForFileLock(holder.get(), file));
+    EXPECT_EQ(test::messageOf(waitForFileLock(waiter.get(), file, std::chrono::milliseconds(50))),
               "Cannot lock " + file.string() + ": another process has held it for 50 ms.");
 }
 
@@ -60,10 +59,10 @@ TEST_F(Lock, KeepsOtherThreadsOutUntilTheOutermostGoes) {
     std::atomic<bool> entered = false;
     std::thread other;
     {
-        const StateLock outer;
-        { const StateLock inner; }
+        const auto outer = StateLock::take();
+        { const auto inner = StateLock::take(); }
         other = std::thread([&] {
-            const StateLock lock;
+            const auto lock = StateLock::take();
             entered = static_cast<bool>(lock);
         });
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
@@ -107,21 +106,19 @@ TEST_F(Lock, ProcessesThatUpdateAtOnceLoseNothing) {
 TEST_F(Lock, IsFreeAgainWhenItsHolderIsKilled) {
     const pid_t child = ::fork();
     if (child == 0) {
-        const StateLock lock;
+        const auto lock = StateLock::take();
         ::kill(::getpid(), SIGKILL);
     }
     int status = 0;
     ASSERT_EQ(::waitpid(child, &status, 0), child);
     ASSERT_TRUE(WIFSIGNALED(status));
-    const StateLock lock;
+    const auto lock = StateLock::take();
     EXPECT_TRUE(lock);
 }
 
 TEST_F(Lock, SaysWhyItCannotBeHad) {
     root_.write("var", "a file where a folder should be");
-    const StateLock lock;
-    EXPECT_FALSE(lock);
-    EXPECT_EQ(lastErrorSentence(),
+    EXPECT_EQ(test::messageOf(StateLock::take()),
               "Cannot lock " + root_.path().string() + "/var/lib/velt/lock: Not a directory.");
 }
 

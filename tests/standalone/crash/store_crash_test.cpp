@@ -1,5 +1,6 @@
 // Every store of the platform, killed at every one of its steps: what is found afterwards is the old or the
 // new, whole, and the next store works.
+#include "base/file.h"
 #include "ftp/ftp_library.h"
 #include "platform/adminlog.h"
 #include "platform/service.h"
@@ -8,7 +9,6 @@
 #include "standalone/accounts/account_sources.h"
 #include "standalone/contract/string_map.h"
 #include "standalone/control/start_failure.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/journal/event_file.h"
 #include "standalone/settings/settings.h"
@@ -42,7 +42,7 @@ std::string unreadable() {
 }
 
 std::string fileText(const char* path) {
-    return readFile(statePath(path)).value_or("no file");
+    return readFile(statePath(path)).valueOr("no file");
 }
 
 int storeRecord(const char* port, int limit) {
@@ -164,14 +164,14 @@ int fillEvents() {
     while (full.size() + line.size() <= largestEventFile) {
         full += line;
     }
-    return result < 0 ? result : replaceFile(statePath("/var/log/velt/events.jsonl"), full, 0640);
+    return result < 0 || replaceFile(statePath("/var/log/velt/events.jsonl"), full, 0640) ? result : -1;
 }
 
 /// How often each event stands there, in whole lines.
 std::string readEvents() {
     std::string all;
     for (const char* file : {"/var/log/velt/events.jsonl.1", "/var/log/velt/events.jsonl"}) {
-        all += readFile(statePath(file)).value_or("");
+        all += readFile(statePath(file)).valueOr("");
     }
     std::map<std::string, int> counts;
     for (std::size_t at = 0; at < all.size();) {

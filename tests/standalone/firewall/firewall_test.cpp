@@ -1,11 +1,11 @@
 // The firewall in force, seen from another host.
 
+#include "base/file.h"
 #include "ftp/ftp_library.h"
 #include "platform/firewall.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/file_store.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -87,10 +87,10 @@ protected:
     }
 
     static void setMode(const std::string& lines) {
-        ASSERT_EQ(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\n" + lines + "\n", 0644), 0);
+        ASSERT_TRUE(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\n" + lines + "\n", 0644));
     }
 
-    static std::string warning() { return readFile(statePath("/run/velt/firewall.warning")).value_or(""); }
+    static std::string warning() { return readFile(statePath("/run/velt/firewall.warning")).valueOr(""); }
 
     std::optional<PrivateNetwork> network_;
 };
@@ -323,7 +323,7 @@ TEST_F(FirewallTest, AStartLoadsTheRulesOnce) {
 }
 
 TEST_F(FirewallTest, AMarkFromBeforeABootIsNoSignOfRules) {
-    ASSERT_EQ(replaceFile(statePath("/run/velt/firewall.loaded"), "another boot", 0644), 0);
+    ASSERT_TRUE(replaceFile(statePath("/run/velt/firewall.loaded"), "another boot", 0644));
     ASSERT_EQ(runProcess({"nft", "add", "table", "inet", "velt_fileserv"}).exitCode, 0);
     setMode("mode = off");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();

@@ -1,7 +1,7 @@
 // velt-supervise as the child of a service manager: what it is told by files, and what it says to the
 // manager.
 
-#include "standalone/core/file_store.h"
+#include "base/file.h"
 #include "standalone/core/installed_files.h"
 #include "standalone/core/state_root.h"
 #include "standalone/supervise/control_channel.h"
@@ -56,7 +56,7 @@ protected:
         const DaemonPlan plan = testPlan(port_, "one", options);
         const ControlRequest request{Command::start,
                                      {plan.configurationHash, plan.listenPorts, plan.arguments}};
-        ASSERT_EQ(replaceFile(orderFile(directory_, "sftp"), encodeRequest(request), 0600), 0);
+        ASSERT_TRUE(replaceFile(orderFile(directory_, "sftp"), encodeRequest(request), 0600));
     }
 
     pid_t run() const {
@@ -134,7 +134,7 @@ TEST_F(ManagedSupervisor, WithoutAnOrderItSaysSo) {
     const pid_t supervisor = run();
     EXPECT_EQ(heard(), "STATUS=nothing in " + directory_.string() + " says what to start");
     EXPECT_EQ(exitCodeOf(supervisor), 1);
-    ASSERT_EQ(replaceFile(orderFile(directory_, "sftp"), encodeRequest({Command::stop, {}}), 0600), 0);
+    ASSERT_TRUE(replaceFile(orderFile(directory_, "sftp"), encodeRequest({Command::stop, {}}), 0600));
     EXPECT_EQ(exitCodeOf(run()), 1) << "not an order to start";
 }
 

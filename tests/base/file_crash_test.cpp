@@ -1,8 +1,8 @@
 // A store interrupted at each of its system calls: the linker puts the functions below in the place of the
 // calls.
-#include "standalone/core/file_store.h"
-#include "standalone/core/last_error.h"
+#include "base/file.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
@@ -96,7 +96,7 @@ namespace {
 const std::string oldContents(10'000, 'o');
 const std::string newContents(20'000, 'n');
 
-class FileStoreCrash : public ::testing::Test {
+class FileCrash : public ::testing::Test {
 protected:
     test::TemporaryFolder folder_;
     std::filesystem::path file_ = folder_.path() / "folder" / "file";
@@ -109,7 +109,7 @@ protected:
         if (child == 0) {
             trouble = kind;
             callsUntilTrouble = call;
-            ::_exit(replaceFile(file_, newContents, 0644) == 0 ? 0 : 1);
+            ::_exit(replaceFile(file_, newContents, 0644) ? 0 : 1);
         }
         int status = 0;
         EXPECT_EQ(::waitpid(child, &status, 0), child);
@@ -120,17 +120,17 @@ protected:
     }
 
     void expectStoreCleansUp() const {
-        ASSERT_EQ(replaceFile(file_, oldContents, 0644), 0) << lastErrorSentence();
+        ASSERT_TRUE(replaceFile(file_, oldContents, 0644));
         EXPECT_EQ(readFile(file_), oldContents);
         const std::filesystem::directory_iterator entries(file_.parent_path());
         EXPECT_EQ(std::distance(begin(entries), end(entries)), 1);
     }
 };
 
-TEST_F(FileStoreCrash, KilledAnywhereLeavesTheOldOrTheNewFileWhole) {
+TEST_F(FileCrash, KilledAnywhereLeavesTheOldOrTheNewFileWhole) {
     std::set<std::string> seen;
     int call = 0;
-    ASSERT_EQ(replaceFile(file_, oldContents, 0644), 0);
+    ASSERT_TRUE(replaceFile(file_, oldContents, 0644));
     while (isKilledAt(call, Trouble::killBefore)) {
         const auto contents = readFile(file_);
         ASSERT_TRUE(contents == oldContents || contents == newContents) << "after call " << call;
@@ -143,8 +143,8 @@ TEST_F(FileStoreCrash, KilledAnywhereLeavesTheOldOrTheNewFileWhole) {
     EXPECT_EQ(seen.size(), 2U) << "both outcomes occur";
 }
 
-TEST_F(FileStoreCrash, KilledWithinTheWriteLeavesTheOldFileWhole) {
-    ASSERT_EQ(replaceFile(file_, oldContents, 0644), 0);
+TEST_F(FileCrash, KilledWithinTheWriteLeavesTheOldFileWhole) {
+    ASSERT_TRUE(replaceFile(file_, oldContents, 0644));
     ASSERT_TRUE(isKilledAt(4, Trouble::killHalf));
 
     EXPECT_EQ(std::filesystem::file_size(file_.parent_path() / ".file.new"), newContents.size() / 2);
@@ -152,7 +152,7 @@ TEST_F(FileStoreCrash, KilledWithinTheWriteLeavesTheOldFileWhole) {
     expectStoreCleansUp();
 }
 
-TEST_F(FileStoreCrash, KilledAnywhereInTheFirstStoreLeavesNoFileOrTheWholeFile) {
+TEST_F(FileCrash, KilledAnywhereInTheFirstStoreLeavesNoFileOrTheWholeFile) {
     int call = 0;
     for (; isKilledAt(call, Trouble::killBefore); ++call) {
         const auto contents = readFile(file_);
@@ -162,23 +162,22 @@ TEST_F(FileStoreCrash, KilledAnywhereInTheFirstStoreLeavesNoFileOrTheWholeFile) 
     EXPECT_EQ(call, 12) << "mkdir, open and fsync come first";
 }
 
-TEST_F(FileStoreCrash, EachFailedCallIsReportedAndLeavesAWholeFile) {
+TEST_F(FileCrash, EachFailedCallIsReportedAndLeavesAWholeFile) {
     std::set<std::string> failedCalls;
     for (int call = 0;; ++call) {
-        ASSERT_EQ(replaceFile(file_, oldContents, 0644), 0);
+        ASSERT_TRUE(replaceFile(file_, oldContents, 0644));
         trouble = Trouble::failCall;
         callsUntilTrouble = call;
         troubleCame = false;
-        clearLastError();
-        const int result = replaceFile(file_, newContents, 0644);
+        const auto result = replaceFile(file_, newContents, 0644);
         trouble = Trouble::none;
         if (!troubleCame) {
-            EXPECT_EQ(result, 0);
+            EXPECT_TRUE(result);
             break;
         }
         failedCalls.insert(troubledCall);
-        EXPECT_LT(result, 0) << troubledCall;
-        EXPECT_NE(lastErrorSentence().find(std::strerror(EIO)), std::string::npos) << lastErrorSentence();
+        EXPECT_NE(test::messageOf(result).find(std::strerror(EIO)), std::string::npos)
+            << troubledCall << ": " << test::messageOf(result);
         const auto contents = readFile(file_);
         EXPECT_TRUE(contents == oldContents || contents == newContents) << troubledCall;
     }

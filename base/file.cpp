@@ -1,7 +1,6 @@
-#include "standalone/core/file_store.h"
+#include "base/file.h"
 
 #include "base/unique_fd.h"
-#include "standalone/core/last_error.h"
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -18,22 +17,16 @@ namespace fs = std::filesystem;
 
 namespace {
 
-int failHere(const char* what, const fs::path& path, int error, SourcePlace where = SourcePlace::current()) {
-    return fail(ErrorNumber::store,
-                std::string("Cannot ") + what + " " + path.string() + ": " + std::strerror(error) + ".",
-                where);
-}
-
-int syncFolder(const fs::path& folder) {
+Result<> syncFolder(const fs::path& folder) {
     const UniqueFd fd(::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (!fd || ::fsync(fd.get()) != 0)
-        return failHere("write the folder", folder, errno);
-    return 0;
+        return cannot("write the folder", folder);
+    return {};
 }
 
 // Each new folder is made durable in the one that holds it, or a crash could take it away again together with
 // the file that was stored in it.
-int makeFolder(const fs::path& folder) {
+Result<> makeFolder(const fs::path& folder) {
     std::vector<fs::path> missing;
     for (fs::path at = folder; !at.empty() && ::access(at.c_str(), F_OK) != 0; at = at.parent_path()) {
         missing.push_back(at);
@@ -42,11 +35,11 @@ int makeFolder(const fs::path& folder) {
     }
     for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
         if (::mkdir(at->c_str(), 0755) != 0 && errno != EEXIST)
-            return failHere("make the folder", *at, errno);
-        if (syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")) < 0)
-            return -1;
+            return cannot("make the folder", *at);
+        if (auto synced = syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")); !synced)
+            return synced;
     }
-    return 0;
+    return {};
 }
 
 // The temporary file has one fixed name, so that what a crash leaves behind is taken up by the next store and
@@ -80,6 +73,11 @@ bool writeAll(int fd, std::string_view contents) {
 
 } // namespace
 
+Error cannot(std::string_view verb, const fs::path& path, int error, SourcePlace where) {
+    return Error("Cannot " + std::string(verb) + " " + path.string() + ": " + std::strerror(error) + ".",
+                 where);
+}
+
 bool isSameFile(int fd, const fs::path& path) {
     struct stat opened {};
     struct stat named {};
@@ -87,34 +85,36 @@ bool isSameFile(int fd, const fs::path& path) {
            opened.st_ino == named.st_ino;
 }
 
-int replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
+Result<> replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
     const fs::path folder = path.has_parent_path() ? path.parent_path() : fs::path(".");
-    if (makeFolder(folder) < 0)
-        return -1;
+    if (auto made = makeFolder(folder); !made)
+        return made;
     fs::path temporary = folder / ".";
     temporary += path.filename();
     temporary += ".new";
     const UniqueFd fd = openTemporary(temporary);
     if (!fd)
-        return failHere("make", temporary, errno);
+        return cannot("make", temporary);
     if (::ftruncate(fd.get(), 0) != 0 || ::fchmod(fd.get(), mode) != 0 || !writeAll(fd.get(), contents) ||
         ::fsync(fd.get()) != 0) {
         const int error = errno;
         ::unlink(temporary.c_str());
-        return failHere("write", temporary, error);
+        return cannot("write", temporary, error);
     }
     if (::rename(temporary.c_str(), path.c_str()) != 0) {
         const int error = errno;
         ::unlink(temporary.c_str());
-        return failHere("replace", path, error);
+        return cannot("replace", path, error);
     }
     return syncFolder(folder);
 }
 
-std::optional<std::string> readFile(const fs::path& path) {
+Result<std::optional<std::string>> readOptionalFile(const fs::path& path) {
     const UniqueFd fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
-    if (!fd)
+    if (!fd && errno == ENOENT)
         return std::nullopt;
+    if (!fd)
+        return cannot("read", path);
     std::string contents;
     std::string block(65536, '\0');
     for (;;) {
@@ -124,12 +124,18 @@ std::optional<std::string> readFile(const fs::path& path) {
         if (got > 0) {
             contents.append(block, 0, static_cast<std::size_t>(got));
         } else if (errno != EINTR) {
-            const int error = errno;
-            contents.clear();
-            errno = error;
-            return std::nullopt;
+            return cannot("read", path);
         }
     }
+}
+
+Result<std::string> readFile(const fs::path& path) {
+    auto contents = readOptionalFile(path);
+    if (!contents)
+        return contents.error();
+    if (!*contents)
+        return cannot("read", path, ENOENT);
+    return std::move(**contents);
 }
 
 } // namespace velt
