@@ -1,10 +1,15 @@
-// The contract's operations on the FTP settings.
 #include "ftp/ftp_library.h"
+
 #include "standalone/control/change_settings.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
+#include "standalone/rules/chroot_users.h"
+#include "standalone/rules/rule_store.h"
 #include "standalone/settings/record_merge.h"
 #include "standalone/settings/settings_store.h"
+#include "standalone/shares/share_store.h"
+
+#include <cstring>
 
 namespace velt {
 
@@ -51,6 +56,100 @@ Result<> storeRecord(const _tag_VELT_FTP_CONF_& record) {
 
 int noPlaceFor(const char* what) {
     return fail(ErrorNumber::invalid, std::string("There is no place for ") + what + ".");
+}
+
+int pushAll(VLIBCSzList** list, const Result<std::vector<std::string>>& texts) {
+    if (list == nullptr || *list == nullptr)
+        return noPlaceFor("the names");
+    if (!texts)
+        return fail(texts.error());
+    for (const std::string& text : *texts)
+        if (VLIBCSzListPush(list, text.c_str()) < 0)
+            return -1;
+    return 0;
+}
+
+std::vector<std::string> textsOf(const VLIBCSzList* list) {
+    std::vector<std::string> texts;
+    for (int i = 0; list != nullptr && i < list->count; i++)
+        texts.emplace_back(VLIBCSzListGet(list, i));
+    return texts;
+}
+
+// The selection under which the module lists what is offered to FTP; it asks for no other.
+constexpr int offeredToFtp = 0x207;
+
+Result<std::vector<std::string>> shareNames(int selection) {
+    if (selection != offeredToFtp)
+        return Error(ErrorNumber::invalid, "Only the shares that are offered to FTP can be listed.");
+    const auto shares = loadShares();
+    if (!shares)
+        return shares.error();
+    std::vector<std::string> names;
+    for (const ShareEntry& share : *shares)
+        if (share.offeredToFtp)
+            names.push_back(share.name);
+    return names;
+}
+
+UserFilter filterOf(int source, const char* substr, const char* domain) {
+    return {source, substr != nullptr ? substr : "", domain != nullptr ? domain : ""};
+}
+
+Result<std::vector<std::string>> ruleLines() {
+    const auto rules = loadRules();
+    if (!rules)
+        return rules.error();
+    std::vector<std::string> lines;
+    for (const ChrootRule& rule : *rules)
+        lines.push_back(formatRule(rule));
+    return lines;
+}
+
+Result<> storeRuleLines(const std::vector<std::string>& lines) {
+    std::vector<ChrootRule> rules;
+    for (const std::string& line : lines) {
+        auto rule = parseRule(line);
+        if (!rule)
+            return Error(ErrorNumber::invalid,
+                         "Chroot rule " + std::to_string(rules.size() + 1) + " cannot be read.");
+        rules.push_back(std::move(*rule));
+    }
+    return storeRules(rules);
+}
+
+bool fits(const std::string& text, int size) {
+    return size > 0 && text.size() < static_cast<std::size_t>(size);
+}
+
+void copyText(const std::string& text, char* buffer) {
+    std::memcpy(buffer, text.c_str(), text.size() + 1);
+}
+
+Result<> splitRule(const char* line, int* isUser, char* name, int nameSize, char* path, int pathSize) {
+    const auto rule = parseRule(line != nullptr ? line : "");
+    if (!rule)
+        return rule.error();
+    const auto owner = ownerOf(*rule);
+    if (!owner)
+        return owner.error();
+    if (!fits(*owner, nameSize) || !fits(rule->path, pathSize))
+        return Error(ErrorNumber::invalid, "The chroot rule of " + *owner + " is too long.");
+    *isUser = rule->isUser ? 1 : 0;
+    copyText(*owner, name);
+    copyText(rule->path, path);
+    return {};
+}
+
+Result<> writeRule(char* buffer, int size, bool isUser, int id, const char* path) {
+    const auto rule = makeRule(isUser, id, path != nullptr ? path : "");
+    if (!rule)
+        return rule.error();
+    const std::string line = formatRule(*rule);
+    if (!fits(line, size))
+        return Error(ErrorNumber::invalid, "The path of the chroot rule is too long.");
+    copyText(line, buffer);
+    return {};
 }
 
 } // namespace
@@ -112,4 +211,43 @@ int VELTFTPDefaultPassivePortGet(VELT_FTP_PORT_RANGE* out) {
         return velt::noPlaceFor("the default passive range");
     *out = velt::defaultPassiveRange;
     return 0;
+}
+
+int VELTFTPShareEnum(VLIBCSzList** list, int selection) {
+    return velt::atBoundary([&] { return velt::pushAll(list, velt::shareNames(selection)); });
+}
+
+int VELTFTPChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain) {
+    return velt::atBoundary(
+        [&] { return velt::pushAll(list, velt::chrootUsers(velt::filterOf(source, substr, domain))); });
+}
+
+int VELTFTPNonChrootUserEnum(VLIBCSzList** list, int source, const char* substr, const char* domain) {
+    return velt::atBoundary(
+        [&] { return velt::pushAll(list, velt::otherUsers(velt::filterOf(source, substr, domain))); });
+}
+
+int VELTFTPAddChrootUser(VLIBCSzList* list) {
+    return velt::atBoundary([&] { return velt::addChrootUsers(velt::textsOf(list)); });
+}
+
+int VELTFTPDeleteChrootUser(VLIBCSzList* list) {
+    return velt::atBoundary([&] { return velt::deleteChrootUsers(velt::textsOf(list)); });
+}
+
+int VELTFTPChrootRuleEnum(VLIBCSzList** list) {
+    return velt::atBoundary([&] { return velt::pushAll(list, velt::ruleLines()); });
+}
+
+int VELTFTPChrootRuleParseToName(const char* line, int* isUser, char* name, int nameSize, char* path,
+                                 int pathSize) {
+    return velt::atBoundary([&] { return velt::splitRule(line, isUser, name, nameSize, path, pathSize); });
+}
+
+int VELTFTPChrootRuleFormat(char* buf, int size, int isUser, int id, const char* path) {
+    return velt::atBoundary([&] { return velt::writeRule(buf, size, isUser != 0, id, path); });
+}
+
+int VELTFTPChrootRuleSave(VLIBCSzList* list) {
+    return velt::atBoundary([&] { return velt::storeRuleLines(velt::textsOf(list)); });
 }

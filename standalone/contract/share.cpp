@@ -1,91 +1,81 @@
 #include "platform/share.h"
 
 #include "base/plain_text.h"
-#include "ftp/ftp_library.h"
-#include "platform/core.h"
 #include "standalone/core/boundary.h"
-#include "standalone/core/last_error.h"
-#include "standalone/shares/share_privilege.h"
+#include "standalone/shares/share_access.h"
 #include "standalone/shares/share_store.h"
 
 #include <algorithm>
 #include <memory>
 #include <string>
 
+namespace velt {
 namespace {
 
-// The selection under which the module lists what is offered to FTP; it asks for no other.
-constexpr int offeredToFtp = 0x207;
-
 struct LoadedShare : VELT_SHARE {
-    explicit LoadedShare(velt::ShareEntry share) : VELT_SHARE{}, entry(std::move(share)) {
+    explicit LoadedShare(ShareEntry share) : VELT_SHARE{}, entry(std::move(share)) {
         name = entry.name.c_str();
         comment = entry.comment.c_str();
         path = entry.path.c_str();
     }
-    velt::ShareEntry entry;
+    ShareEntry entry;
 };
 
+Result<> find(const char* name, VELT_SHARE** out) {
+    if (name == nullptr || out == nullptr) {
+        return Error(ErrorNumber::invalid, "A share look-up needs a name.");
+    }
+    auto shares = loadShares();
+    if (!shares) {
+        return shares.error();
+    }
+    const auto found = std::ranges::find(*shares, name, &ShareEntry::name);
+    if (found == shares->end()) {
+        return Error(ErrorNumber::notFound, "There is no share \"" + plainText(name, 120) + "\".");
+    }
+    *out = std::make_unique<LoadedShare>(std::move(*found)).release();
+    return {};
+}
+
+/// The code in which the contract answers.
+std::int32_t codeOf(std::optional<Access> access) {
+    if (!access) {
+        return 0;
+    }
+    switch (*access) {
+    case Access::write:
+        return 1;
+    case Access::read:
+        return 2;
+    case Access::none:
+        break;
+    }
+    return 4;
+}
+
+Result<> tellPrivilege(const char* account, const VELT_SHARE* share, VELT_SHARE_PRIV* out) {
+    if (account == nullptr || share == nullptr || out == nullptr) {
+        return Error(ErrorNumber::invalid, "A privilege look-up needs an account and a share.");
+    }
+    const auto access = accessOf(account, static_cast<const LoadedShare*>(share)->entry);
+    if (!access) {
+        return access.error();
+    }
+    *out = {{0, 0}, codeOf(*access)};
+    return {};
+}
+
 } // namespace
+} // namespace velt
 
 int VELTShareGet(const char* name, VELT_SHARE** out) {
-    return velt::atBoundary([&] {
-        if (name == nullptr || out == nullptr) {
-            return velt::fail(velt::ErrorNumber::invalid, "A share look-up needs a name.");
-        }
-        std::optional<std::vector<velt::ShareEntry>> shares = velt::allShares();
-        if (!shares) {
-            return -1;
-        }
-        const auto found = std::find_if(shares->begin(), shares->end(),
-                                        [name](const velt::ShareEntry& share) { return share.name == name; });
-        if (found == shares->end()) {
-            return velt::fail(velt::ErrorNumber::notFound,
-                              "There is no share \"" + velt::plainText(name, 120) + "\".");
-        }
-        *out = std::make_unique<LoadedShare>(std::move(*found)).release();
-        return 0;
-    });
+    return velt::atBoundary([&] { return velt::find(name, out); });
 }
 
 int VELTShareUGPrivGetLocal(const char* account, VELT_SHARE* share, VELT_SHARE_PRIV* out) {
-    return velt::atBoundary([&] {
-        if (account == nullptr || share == nullptr || out == nullptr) {
-            return velt::fail(velt::ErrorNumber::invalid,
-                              "A privilege look-up needs an account and a share.");
-        }
-        const std::optional<velt::SharePrivilege> privilege =
-            velt::privilegeOn(static_cast<const LoadedShare*>(share)->entry, account);
-        if (!privilege) {
-            return -1;
-        }
-        *out = {{0, 0}, static_cast<std::int32_t>(*privilege)};
-        return 0;
-    });
+    return velt::atBoundary([&] { return velt::tellPrivilege(account, share, out); });
 }
 
 void VELTShareFree(VELT_SHARE* share) {
-    const std::unique_ptr<LoadedShare> owner(static_cast<LoadedShare*>(share));
-}
-
-int VELTFTPShareEnum(VLIBCSzList** list, int selection) {
-    return velt::atBoundary([&] {
-        if (list == nullptr || *list == nullptr) {
-            return velt::fail(velt::ErrorNumber::invalid, "A listing of shares needs a list to fill.");
-        }
-        if (selection != offeredToFtp) {
-            return velt::fail(velt::ErrorNumber::invalid,
-                              "Only the shares that are offered to FTP can be listed.");
-        }
-        const std::optional<std::vector<velt::ShareEntry>> shares = velt::allShares();
-        if (!shares) {
-            return -1;
-        }
-        for (const velt::ShareEntry& share : *shares) {
-            if (share.offeredToFtp && VLIBCSzListPush(list, share.name.c_str()) < 0) {
-                return -1;
-            }
-        }
-        return 0;
-    });
+    const std::unique_ptr<velt::LoadedShare> owner(static_cast<velt::LoadedShare*>(share));
 }

@@ -1,6 +1,6 @@
 #include "standalone/login/grants.h"
 
-#include "standalone/shares/share_privilege.h"
+#include "standalone/shares/share_access.h"
 
 #include <algorithm>
 
@@ -20,7 +20,7 @@ bool isStrictlyBelow(const std::filesystem::path& place, const std::filesystem::
 
 } // namespace
 
-Grants::Grants(const Login& login, const std::vector<ShareEntry>& shares) : login_(login) {
+Grants::Grants(const Identity& user, const std::vector<ShareEntry>& shares) : user_(user) {
     for (const ShareEntry& share : shares) {
         std::error_code error;
         auto place = std::filesystem::weakly_canonical(share.path, error);
@@ -34,16 +34,8 @@ Grants::Grants(const Login& login, const std::vector<ShareEntry>& shares) : logi
 }
 
 Access Grants::on(const ShareEntry& share) const {
-    switch (privilegeOfUser(share, login_.user, login_.uid, login_.gids).value_or(SharePrivilege::none)) {
-    case SharePrivilege::readWrite:
-        return Access::write;
-    case SharePrivilege::readOnly:
-        return Access::read;
-    case SharePrivilege::none:
-    case SharePrivilege::denied:
-        break;
-    }
-    return Access::none;
+    const auto access = accessOf(user_, share);
+    return access ? access->value_or(Access::none) : Access::none;
 }
 
 Access Grants::leastAt(const std::filesystem::path& place, const std::filesystem::path& outer,
@@ -65,7 +57,7 @@ std::vector<Restriction> Grants::restrictionsBelow(const std::filesystem::path& 
             continue;
         }
         if (const Access here = on(*known.share); here < access) {
-            restrictions.push_back({within(known.place, place), here == Access::none});
+            restrictions.push_back({within(known.place, place), here});
         }
     }
     return restrictions;

@@ -2,30 +2,23 @@
 #ifndef VELT_STANDALONE_LOGIN_GRANTS_H
 #define VELT_STANDALONE_LOGIN_GRANTS_H
 
-#include "standalone/login/login.h"
 #include "standalone/login/view_mounts.h"
-#include "standalone/shares/share_store.h"
+#include "standalone/shares/share.h"
 
 #include <vector>
 
 namespace velt {
-
-enum class Access {
-    none,
-    read,
-    write,
-};
 
 /// Shares may lie within each other: the inner one then counts for its part of the outer one as well, and can
 /// take from what the outer one grants, but not add to it. Folders are told by their paths without symbolic
 /// links; a folder that is mounted at a second place as well is known at the place of its share only.
 class Grants {
 public:
-    /// `shares` must outlive this.
-    Grants(const Login& login, const std::vector<ShareEntry>& shares);
+    /// Both must outlive this.
+    Grants(const Identity& user, const std::vector<ShareEntry>& shares);
 
-    /// What the store grants and the file system allows, whichever is less; nothing where the store says
-    /// nothing, or where it cannot be told.
+    /// What the store grants and the file system allows, whichever is less; none also where the store says
+    /// nothing, or where the file system cannot be asked.
     Access on(const ShareEntry& share) const;
 
     /// The least of `access` and of what the login may do with the shares below `outer` (a folder) in which
@@ -42,7 +35,7 @@ private:
         std::filesystem::path place; ///< free of links as far as it exists
     };
 
-    const Login& login_;
+    const Identity& user_;
     std::vector<Known> known_; ///< outer ones come first
 };
 

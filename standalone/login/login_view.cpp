@@ -1,6 +1,6 @@
 #include "standalone/login/login_view.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/trusted_file.h"
@@ -11,173 +11,198 @@
 #include "standalone/shares/share_file.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
 #include <optional>
 
 namespace velt {
 namespace {
 
-bool refuse(const std::string& why) {
-    fail(ErrorNumber::invalid, why);
-    return false;
+Error refuse(std::string why, SourcePlace where = SourcePlace::current()) {
+    return {ErrorNumber::invalid, std::move(why), where};
 }
 
 // A missing file is the same as no share, but for rules, which could have been taken away with their file.
-std::optional<std::vector<ShareEntry>> readShares() {
+Result<std::vector<ShareEntry>> readShares() {
     const auto path = statePath(paths::shares);
     std::error_code error;
     if (std::filesystem::symlink_status(path, error).type() == std::filesystem::file_type::not_found) {
         return std::vector<ShareEntry>();
     }
     const auto text = readTrusted(path);
-    if (!text) {
-        fail(text.error());
-        return std::nullopt;
-    }
-    std::string flaw;
-    auto shares = parseShares(*text, flaw);
-    if (!shares) {
-        refuse("The file " + path.string() + " is damaged: " + flaw + ".");
-    }
-    return shares;
+    return text ? parseShares(*text) : text.error();
 }
 
-/// The path of the rule that applies, "" for none.
-std::optional<std::string> readRule(const Login& login) {
+/// The path of the rule that the user follows, if any.
+Result<std::optional<std::string>> readRule(const Identity& user) {
     const auto text = readTrusted(statePath(paths::chrootRules));
     if (!text) {
-        fail(text.error());
-        return std::nullopt;
+        return text.error();
     }
     const auto rules = parseRules(*text);
     if (!rules) {
-        return std::nullopt;
+        return rules.error();
     }
-    const auto ofUser = std::ranges::find_if(
-        *rules, [&](const ChrootRule& rule) { return rule.isUser && rule.id == login.uid; });
-    const auto rule = ofUser != rules->end() ? ofUser : std::ranges::find_if(*rules, [&](const auto& one) {
-        return !one.isUser && std::ranges::find(login.gids, one.id) != login.gids.end();
-    });
-    return rule != rules->end() ? rule->path : std::string();
+    const ChrootRule* const rule = ruleFor(*rules, user.uid, user.gids);
+    return rule != nullptr ? std::optional(rule->path) : std::nullopt;
 }
 
-/// Shows a folder of which the login may use so much, seen from the share or home at `outer`.
-bool showOne(const std::filesystem::path& root, UniqueFd folder, const std::filesystem::path& outer,
-             Access access, const Grants& grants) {
+class ViewMaker {
+public:
+    ViewMaker(const Login& login, const std::filesystem::path& root, const std::vector<ShareEntry>& shares)
+        : login_(login), root_(root), shares_(shares), grants_(login.user, shares) {}
+
+    Result<> showHome();
+    /// Shows the folder "/share/below/it".
+    Result<> showInShare(const std::string& path);
+    Result<> showShares();
+    Result<> showToAnonymous();
+
+    std::vector<std::string> remarks;
+
+private:
+    /// Shows a folder of which the login may use so much, seen from the share or home at `outer`.
+    Result<> showOne(UniqueFd folder, const std::filesystem::path& outer, Access access);
+    Result<> addShare(SideBySide& view, const ShareEntry& share, Access access);
+
+    const Login& login_;
+    const std::filesystem::path& root_;
+    const std::vector<ShareEntry>& shares_;
+    Grants grants_;
+};
+
+Result<> ViewMaker::showOne(UniqueFd folder, const std::filesystem::path& outer, Access access) {
     const auto place = placeOf(folder);
-    if (place.empty() || outer.empty()) {
-        return refuse("The place of the folder cannot be told.");
+    if (!place) {
+        return place.error();
     }
-    access = grants.leastAt(place, outer, access);
+    access = grants_.leastAt(*place, outer, access);
     if (access == Access::none) {
-        return refuse("The shares grant no access to " + place.string() + ".");
+        return refuse("The shares grant no access to " + place->string() + ".");
     }
-    return showFolder(root,
-                      {std::move(folder), access == Access::read, grants.restrictionsBelow(place, access)});
+    return showFolder(root_, {std::move(folder), access, grants_.restrictionsBelow(*place, access)});
 }
 
-bool showHome(const Login& login, const std::filesystem::path& root, const Grants& grants) {
-    UniqueFd home = openFolderAs(login, login.home);
+Result<> ViewMaker::showHome() {
+    auto home = openFolderAs(login_.user, login_.home);
     if (!home) {
-        return refuse("The home " + login.home + " cannot be opened: " + std::strerror(errno) + ".");
+        return home.error();
     }
-    const auto place = placeOf(home);
-    if (place == "/") {
+    const auto place = placeOf(*home);
+    if (!place) {
+        return place.error();
+    }
+    if (*place == "/") {
         return refuse("The home is the root directory of the server.");
     }
     // Of the shares around the home none counts: it is the user's own. A share that is the home counts.
-    return showOne(root, std::move(home), place.parent_path(), Access::write, grants);
+    return showOne(std::move(*home), place->parent_path(), Access::write);
 }
 
-/// Shows the folder "/share/below/it".
-bool showInShare(const Login& login, const std::filesystem::path& root, const std::string& path,
-                 const std::vector<ShareEntry>& shares, const Grants& grants) {
+Result<> ViewMaker::showInShare(const std::string& path) {
     const auto end = std::min(path.find('/', 1), path.size());
-    const auto share = std::ranges::find(shares, path.substr(1, end - 1), &ShareEntry::name);
-    if (share == shares.end()) {
+    const auto share = std::ranges::find(shares_, path.substr(1, end - 1), &ShareEntry::name);
+    if (share == shares_.end()) {
         return refuse("There is no share for " + path + ".");
     }
-    const Access access = grants.on(*share);
+    const Access access = grants_.on(*share);
     if (access == Access::none) {
         return refuse("The share " + share->name + " grants no access.");
     }
-    UniqueFd folder = openFolderAs(login, share->path);
-    const auto outer = folder ? placeOf(folder) : std::filesystem::path();
-    if (folder && end < path.size()) {
-        folder = openFolderBelow(login, folder, path.substr(end + 1));
-    }
+    auto folder = openFolderAs(login_.user, share->path);
     if (!folder) {
-        return refuse("The folder for " + path + " cannot be opened: " + std::strerror(errno) + ".");
+        return folder.error();
     }
-    return showOne(root, std::move(folder), outer, access, grants);
+    const auto outer = placeOf(*folder);
+    if (!outer) {
+        return outer.error();
+    }
+    if (end < path.size()) {
+        folder = openFolderBelow(login_.user, *folder, path.substr(end + 1));
+    }
+    return folder ? showOne(std::move(*folder), *outer, access) : folder.error();
 }
 
-bool showShares(const Login& login, const std::filesystem::path& root, const std::vector<ShareEntry>& shares,
-                const Grants& grants, std::vector<std::string>& remarks) {
-    SideBySide view(root);
-    if (!view.begin()) {
-        return false;
+Result<> ViewMaker::addShare(SideBySide& view, const ShareEntry& share, Access access) {
+    auto folder = openFolderAs(login_.user, share.path);
+    if (!folder) {
+        return folder.error();
     }
-    for (const ShareEntry& share : shares) {
-        const Access access = share.offeredToFtp ? grants.on(share) : Access::none;
+    const auto place = placeOf(*folder);
+    if (!place) {
+        return place.error();
+    }
+    return view.add(share.name, {std::move(*folder), access, grants_.restrictionsBelow(*place, access)});
+}
+
+Result<> ViewMaker::showShares() {
+    SideBySide view(root_);
+    if (const Result<> begun = view.begin(); !begun) {
+        return begun;
+    }
+    for (const ShareEntry& share : shares_) {
+        const Access access = share.offeredToFtp ? grants_.on(share) : Access::none;
         if (access == Access::none) {
             continue;
         }
-        UniqueFd folder = openFolderAs(login, share.path);
-        const auto place = folder ? placeOf(folder) : std::filesystem::path();
-        if (place.empty()) {
-            remarks.push_back("The share " + share.name + " is left out: its folder cannot be opened.");
-        } else if (!view.add(share.name, {std::move(folder), access == Access::read,
-                                          grants.restrictionsBelow(place, access)})) {
-            remarks.push_back("The share " + share.name + " is left out: " + lastErrorSentence());
+        if (const Result<> added = addShare(view, share, access); !added) {
+            remarks.push_back("The share " + share.name + " is left out: " + added.error().message);
         }
     }
     return view.finish();
 }
 
-bool showToAnonymous(const Login& login, const std::filesystem::path& root,
-                     const std::vector<ShareEntry>& shares, const Grants& grants,
-                     std::vector<std::string>& remarks) {
-    if (login.anonymousShare.empty()) {
-        return showShares(login, root, shares, grants, remarks);
+Result<> ViewMaker::showToAnonymous() {
+    if (login_.anonymousShare.empty()) {
+        return showShares();
     }
-    const auto name = readTrusted(login.anonymousShare);
+    const auto name = readTrusted(login_.anonymousShare);
     if (!name) {
-        return false;
+        return name.error();
     }
-    const auto share = std::ranges::find(shares, *name, &ShareEntry::name);
-    if (share == shares.end() || !share->offeredToFtp) {
+    const auto share = std::ranges::find(shares_, *name, &ShareEntry::name);
+    if (share == shares_.end() || !share->offeredToFtp) {
         return refuse("The share for anonymous users is gone, or is not offered to FTP.");
     }
-    return showInShare(login, root, "/" + *name, shares, grants);
+    return showInShare("/" + *name);
+}
+
+Result<> show(ViewMaker& maker, DefaultView view, const std::optional<std::string>& rule) {
+    if (view == DefaultView::anonymous) {
+        return maker.showToAnonymous();
+    }
+    if (rule && *rule != homePath) {
+        return maker.showInShare(*rule);
+    }
+    return !rule && view == DefaultView::shares ? maker.showShares() : maker.showHome();
 }
 
 } // namespace
 
-bool makeLoginView(const Login& login, const std::filesystem::path& root, std::vector<std::string>& remarks) {
-    const bool anonymous = login.kind == LoginKind::anonymous;
-    const auto rule = anonymous ? std::string() : readRule(login);
-    if (!rule) {
-        return false;
+Result<std::vector<std::string>> makeLoginView(const Login& login, const std::filesystem::path& root) {
+    std::optional<std::string> rule;
+    if (login.view != DefaultView::anonymous) {
+        auto read = readRule(login.user);
+        if (!read) {
+            return read.error();
+        }
+        rule = std::move(*read);
     }
-    if (login.kind == LoginKind::server) {
-        return rule->empty() || refuse("A login cannot be confined without root's rights.");
+    if (login.view == DefaultView::server) {
+        return rule ? Result<std::vector<std::string>>(
+                          refuse("A login cannot be confined without root's rights."))
+                    : std::vector<std::string>();
     }
     const auto shares = readShares();
-    if (!shares || !isolateMounts()) {
-        return false;
+    if (!shares) {
+        return shares.error();
     }
-    const Grants grants(login, *shares);
-    if (anonymous) {
-        return showToAnonymous(login, root, *shares, grants, remarks);
+    if (const Result<> isolated = isolateMounts(); !isolated) {
+        return isolated.error();
     }
-    if (!rule->empty() && *rule != homePath) {
-        return showInShare(login, root, *rule, *shares, grants);
+    ViewMaker maker(login, root, *shares);
+    if (const Result<> shown = show(maker, login.view, rule); !shown) {
+        return shown.error();
     }
-    return rule->empty() && login.kind == LoginKind::shares
-               ? showShares(login, root, *shares, grants, remarks)
-               : showHome(login, root, grants);
+    return std::move(maker.remarks);
 }
 
 } // namespace velt

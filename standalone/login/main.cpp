@@ -1,15 +1,14 @@
-// velt-login-view STATE KIND ROOT USER UID GIDS HOME [FILE]
+// velt-login-view STATE VIEW ROOT USER UID GIDS HOME [FILE]
 //
 // Makes the folder ROOT show what a login of the FTP daemon may see, in the mount namespace of the session
 // that started this program, and ends: with 0 when the session may go on with ROOT as its root directory,
 // else with why not on standard error. Nobody else sees anything of it, and it is gone when the session has
 // ended.
 //
-// STATE is the state root; KIND is "home", "shares", "anonymous" or "server", as in login.h; GIDS are the
-// numbers of the user's groups, the primary one first, separated by commas; FILE names the share of
+// STATE is the state root; VIEW is "home", "shares", "anonymous" or "server", as in login_view.h; GIDS are
+// the numbers of the user's groups, the primary one first, separated by commas; FILE names the share of
 // anonymous users.
 #include "base/plain_text.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/login/login_view.h"
 
@@ -17,6 +16,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cstdio>
@@ -25,15 +25,12 @@
 #include <optional>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 namespace {
 
-constexpr std::array kinds{
-    std::pair{"home", velt::LoginKind::home},
-    std::pair{"shares", velt::LoginKind::shares},
-    std::pair{"anonymous", velt::LoginKind::anonymous},
-    std::pair{"server", velt::LoginKind::server},
-};
+/// In the order of DefaultView.
+constexpr std::array<std::string_view, 4> views{"home", "shares", "anonymous", "server"};
 
 std::optional<unsigned> numberOf(std::string_view text) {
     unsigned number = 0;
@@ -43,38 +40,36 @@ std::optional<unsigned> numberOf(std::string_view text) {
     return whole && number != static_cast<unsigned>(-1) ? std::optional(number) : std::nullopt;
 }
 
-bool readNumbers(std::string_view text, std::vector<gid_t>& numbers) {
+std::optional<std::vector<gid_t>> numbersOf(std::string_view text) {
+    std::vector<gid_t> numbers;
     for (;;) {
         const auto comma = text.find(',');
         const auto number = numberOf(text.substr(0, comma));
         if (!number) {
-            return false;
+            return std::nullopt;
         }
         numbers.push_back(*number);
         if (comma == std::string_view::npos) {
-            return true;
+            return numbers;
         }
         text.remove_prefix(comma + 1);
     }
 }
 
-bool readLogin(int count, char** arguments, velt::Login& login) {
+std::optional<velt::Login> loginOf(int count, char** arguments) {
     if (count != 8 && count != 9) {
-        return false;
+        return std::nullopt;
     }
-    bool known = false;
-    for (const auto& [word, kind] : kinds) {
-        if (std::string_view(arguments[2]) == word) {
-            login.kind = kind;
-            known = true;
-        }
-    }
+    const auto view = std::ranges::find(views, arguments[2]);
     const auto uid = numberOf(arguments[5]);
-    login.user = arguments[4];
-    login.uid = uid.value_or(0);
-    login.home = arguments[7];
-    login.anonymousShare = count == 9 ? arguments[8] : "";
-    return known && uid && readNumbers(arguments[6], login.gids);
+    auto gids = numbersOf(arguments[6]);
+    if (view == views.end() || !uid || !gids) {
+        return std::nullopt;
+    }
+    return velt::Login{static_cast<velt::DefaultView>(view - views.begin()),
+                       {arguments[4], *uid, std::move(*gids)},
+                       arguments[7],
+                       count == 9 ? arguments[8] : ""};
 }
 
 // The daemon has put a user's numbers in the place of some of root's.
@@ -89,20 +84,20 @@ int refuse(std::string_view why) {
 }
 
 int run(int count, char** arguments) {
-    velt::Login login;
-    if (!readLogin(count, arguments, login)) {
-        return refuse("usage: velt-login-view STATE KIND ROOT USER UID GIDS HOME [FILE]");
+    const auto login = loginOf(count, arguments);
+    if (!login) {
+        return refuse("usage: velt-login-view STATE VIEW ROOT USER UID GIDS HOME [FILE]");
     }
     umask(022);
     if (!becomeRoot()) {
         return refuse("Root's rights cannot be taken.");
     }
     velt::setStateRoot(arguments[1]);
-    std::vector<std::string> remarks;
-    if (!velt::makeLoginView(login, arguments[3], remarks)) {
-        return refuse(velt::lastErrorSentence());
+    const auto remarks = velt::makeLoginView(*login, arguments[3]);
+    if (!remarks) {
+        return refuse(remarks.error().message);
     }
-    for (const std::string& remark : remarks) {
+    for (const std::string& remark : *remarks) {
         std::fprintf(stderr, "%s\n", velt::plainText(remark, 500).c_str());
     }
     return EXIT_SUCCESS;

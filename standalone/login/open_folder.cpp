@@ -1,5 +1,8 @@
 #include "standalone/login/open_folder.h"
 
+#include "base/file.h"
+#include "standalone/core/error_number.h"
+
 #include <fcntl.h>
 #include <grp.h>
 #include <linux/openat2.h>
@@ -19,12 +22,12 @@ constexpr int asFolder = O_PATH | O_DIRECTORY | O_CLOEXEC;
 // files away with the number.
 class FileRightsOf {
 public:
-    explicit FileRightsOf(const Login& login) : taken_(setgroups(login.gids.size(), login.gids.data()) == 0) {
-        setfsgid(login.gids.front());
-        setfsuid(login.uid);
+    explicit FileRightsOf(const Identity& user) : taken_(setgroups(user.gids.size(), user.gids.data()) == 0) {
+        setfsgid(user.gids.front());
+        setfsuid(user.uid);
         // Neither call tells whether it failed, but each answers who it was before.
-        taken_ = taken_ && static_cast<uid_t>(setfsuid(login.uid)) == login.uid &&
-                 static_cast<gid_t>(setfsgid(login.gids.front())) == login.gids.front();
+        taken_ = taken_ && static_cast<uid_t>(setfsuid(user.uid)) == user.uid &&
+                 static_cast<gid_t>(setfsgid(user.gids.front())) == user.gids.front();
     }
     ~FileRightsOf() {
         setfsuid(geteuid());
@@ -40,49 +43,49 @@ private:
     bool taken_;
 };
 
-UniqueFd openBelow(const UniqueFd& folder, const std::filesystem::path& path, unsigned long long resolve) {
+Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& path,
+                           unsigned long long resolve) {
     open_how how{};
     how.flags = asFolder;
     how.resolve = resolve;
     // The kernel gives up when folders move while it follows a path that must stay below one.
     for (int attempt = 0; attempt < 100; attempt++) {
         const long fd = syscall(SYS_openat2, folder.get(), path.c_str(), &how, sizeof how);
-        if (fd >= 0 || errno != EAGAIN) {
+        if (fd >= 0) {
             return UniqueFd(static_cast<int>(fd));
         }
+        if (errno != EAGAIN) {
+            break;
+        }
     }
-    return UniqueFd();
+    const int error = errno;
+    return cannot("open", placeOf(folder).valueOr({}) / path, error);
 }
 
 } // namespace
 
-UniqueFd openFolder(const std::filesystem::path& path) {
-    return UniqueFd(open(path.c_str(), asFolder));
+Result<UniqueFd> openFolder(const std::filesystem::path& path) {
+    UniqueFd folder(open(path.c_str(), asFolder));
+    return folder ? Result<UniqueFd>(std::move(folder)) : cannot("open", path);
 }
 
-UniqueFd openFolderAs(const Login& login, const std::filesystem::path& path) {
-    const FileRightsOf rights(login);
-    if (!rights.taken()) {
-        errno = EPERM;
-        return UniqueFd();
-    }
-    return openFolder(path);
+Result<UniqueFd> openFolderAs(const Identity& user, const std::filesystem::path& path) {
+    const FileRightsOf rights(user);
+    return rights.taken() ? openFolder(path) : cannot("open", path, EPERM);
 }
 
-UniqueFd openFolderBelow(const Login& login, const UniqueFd& folder, const std::filesystem::path& path) {
-    const FileRightsOf rights(login);
-    if (!rights.taken()) {
-        errno = EPERM;
-        return UniqueFd();
-    }
-    return openBelow(folder, path, RESOLVE_BENEATH | RESOLVE_NO_MAGICLINKS);
+Result<UniqueFd> openFolderBelow(const Identity& user, const UniqueFd& folder,
+                                 const std::filesystem::path& path) {
+    const FileRightsOf rights(user);
+    return rights.taken() ? openBelow(folder, path, RESOLVE_BENEATH | RESOLVE_NO_MAGICLINKS)
+                          : cannot("open", path, EPERM);
 }
 
-UniqueFd openFolderExactly(const UniqueFd& folder, const std::filesystem::path& path) {
+Result<UniqueFd> openFolderExactly(const UniqueFd& folder, const std::filesystem::path& path) {
     return openBelow(folder, path, RESOLVE_BENEATH | RESOLVE_NO_SYMLINKS);
 }
 
-std::filesystem::path placeOf(const UniqueFd& folder) {
+Result<std::filesystem::path> placeOf(const UniqueFd& folder) {
     std::error_code error;
     std::filesystem::path place =
         std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(folder.get()), error);
@@ -91,7 +94,7 @@ std::filesystem::path placeOf(const UniqueFd& folder) {
     // The kernel marks the place of a removed folder in words that could be a name as well.
     if (error || fstat(folder.get(), &here) < 0 || stat(place.c_str(), &there) < 0 ||
         here.st_dev != there.st_dev || here.st_ino != there.st_ino) {
-        return {};
+        return Error(ErrorNumber::store, "The place of the folder cannot be told.");
     }
     return place;
 }

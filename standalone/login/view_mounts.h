@@ -2,7 +2,9 @@
 #ifndef VELT_STANDALONE_LOGIN_VIEW_MOUNTS_H
 #define VELT_STANDALONE_LOGIN_VIEW_MOUNTS_H
 
+#include "base/result.h"
 #include "base/unique_fd.h"
+#include "standalone/shares/access.h"
 
 #include <filesystem>
 #include <string>
@@ -12,40 +14,37 @@ namespace velt {
 
 /// A folder within a visible one that may be used less than what is around it.
 struct Restriction {
-    std::filesystem::path place; ///< relative to the visible folder, free of links; outer ones come first
-    bool hidden = false;         ///< nothing of it can be seen; else it is for reading only
+    std::filesystem::path place;  ///< relative to the visible folder, free of links; outer ones come first
+    Access access = Access::none; ///< none: nothing of it can be seen
 };
 
 struct VisibleFolder {
     UniqueFd folder;
-    bool readOnly = false;
+    Access access = Access::read; ///< read or write
     std::vector<Restriction> restrictions;
 };
 
-/// Lets nothing that is mounted from now on reach other mount namespaces. False, with the last error set, on
-/// failure.
-bool isolateMounts();
+/// Lets nothing that is mounted from now on reach other mount namespaces.
+Result<> isolateMounts();
 
-/// Makes `root` show this folder. False, with the last error set, when it cannot be shown exactly so; what
-/// stands at `root` must not be used then.
-bool showFolder(const std::filesystem::path& root, const VisibleFolder& visible);
+/// Makes `root` show this folder. After an error `root` must not be used: it may show more.
+Result<> showFolder(const std::filesystem::path& root, const VisibleFolder& visible);
 
 /// Several folders side by side below a root in which nothing else can be made.
 class SideBySide {
 public:
     explicit SideBySide(std::filesystem::path root) : root_(std::move(root)) {}
 
-    /// To be called first. False, with the last error set, on failure.
-    bool begin();
-    /// False, with the last error set, when the folder cannot be shown exactly so, and is left out.
-    bool add(const std::string& name, const VisibleFolder& visible);
-    /// To be called last. False, with the last error set, on failure: what stands at the root must not be
-    /// used then.
-    bool finish();
+    /// To be called first.
+    Result<> begin();
+    /// An error when the folder cannot be shown exactly so; it is left out then.
+    Result<> add(const std::string& name, const VisibleFolder& visible);
+    /// To be called last. After an error the root must not be used.
+    Result<> finish();
 
 private:
     std::filesystem::path root_;
-    bool spoiled_ = false;
+    bool spoiled_ = false; ///< something is there with more rights than it should give
 };
 
 } // namespace velt

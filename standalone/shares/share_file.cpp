@@ -1,6 +1,9 @@
 #include "standalone/shares/share_file.h"
 
 #include "base/plain_text.h"
+#include "standalone/core/error_number.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/state_root.h"
 
 #include <json/json.h>
 
@@ -9,7 +12,6 @@
 #include <exception>
 #include <initializer_list>
 #include <memory>
-#include <stdexcept>
 
 namespace velt {
 
@@ -17,142 +19,153 @@ namespace {
 
 constexpr int formVersion = 1;
 
-struct GrantWord {
-    ShareGrant grant;
-    const char* word;
-};
-constexpr std::array<GrantWord, 3> grantWords{{
-    {ShareGrant::none, "none"},
-    {ShareGrant::read, "read"},
-    {ShareGrant::write, "write"},
-}};
+/// In the order of Access.
+constexpr std::array accessWords{"none", "read", "write"};
 
-/// What is wrong with the text, on its way from where it is seen to where it is reported.
-class Flaw : public std::runtime_error {
-    using std::runtime_error::runtime_error;
-};
-
-void requireOnlyKeys(const Json::Value& object, std::initializer_list<std::string_view> known) {
-    for (const std::string& key : object.getMemberNames()) {
-        if (std::find(known.begin(), known.end(), key) == known.end()) {
-            throw Flaw("has the unknown key \"" + plainText(key, 80) + "\"");
-        }
-    }
+Error damaged(const std::string& why) {
+    return {ErrorNumber::damaged, statePath(paths::shares).string() + " is damaged: " + why + "."};
 }
 
-std::string textAt(const Json::Value& object, const char* key) {
-    if (!object[key].isString()) {
-        throw Flaw("has no text \"" + std::string(key) + "\"");
-    }
-    return object[key].asString();
-}
-
-std::map<std::string, ShareGrant> grantsAt(const Json::Value& object, const char* key) {
-    std::map<std::string, ShareGrant> grants;
-    if (!object.isMember(key)) {
-        return grants;
-    }
-    const Json::Value& entries = object[key];
-    if (!entries.isObject()) {
-        throw Flaw("has \"" + std::string(key) + "\" that is no object");
-    }
-    for (const std::string& account : entries.getMemberNames()) {
-        const Json::Value& value = entries[account];
-        const auto* const word =
-            std::find_if(grantWords.begin(), grantWords.end(), [&value](const GrantWord& known) {
-                return value.isString() && value == known.word;
-            });
-        if (word == grantWords.end()) {
-            throw Flaw("grants \"" + plainText(account, 80) +
-                       "\" something other than \"none\", \"read\" or \"write\"");
-        }
-        grants.emplace(account, word->grant);
-    }
-    return grants;
-}
-
-ShareEntry shareOf(const Json::Value& object) {
-    if (!object.isObject()) {
-        throw Flaw("is no object");
-    }
-    requireOnlyKeys(object, {"name", "comment", "path", "ftp", "users", "groups"});
-    ShareEntry share;
-    share.name = textAt(object, "name");
-    share.path = textAt(object, "path");
-    if (object.isMember("comment")) {
-        share.comment = textAt(object, "comment");
-    }
-    if (object.isMember("ftp")) {
-        if (!object["ftp"].isBool()) {
-            throw Flaw("has \"ftp\" that is neither true nor false");
-        }
-        share.offeredToFtp = object["ftp"].asBool();
-    }
-    share.users = grantsAt(object, "users");
-    share.groups = grantsAt(object, "groups");
-    return share;
-}
-
-std::vector<ShareEntry> sharesOf(const Json::Value& root) {
-    if (!root.isObject()) {
-        throw Flaw("the file is no object");
-    }
-    if (!root["version"].isInt() || root["version"].asInt() != formVersion) {
-        throw Flaw("\"version\" is not 1");
-    }
-    if (!root["shares"].isArray()) {
-        throw Flaw("\"shares\" is no array");
-    }
-    for (const std::string& key : root.getMemberNames()) {
-        if (key != "version" && key != "shares") {
-            throw Flaw("the unknown key \"" + plainText(key, 80) + "\"");
-        }
-    }
-    std::vector<ShareEntry> shares;
-    for (Json::ArrayIndex i = 0; i < root["shares"].size(); ++i) {
-        try {
-            shares.push_back(shareOf(root["shares"][i]));
-        } catch (const Flaw& flaw) {
-            throw Flaw("share " + std::to_string(i + 1) + " " + flaw.what());
-        }
-    }
-    if (const std::optional<std::string> flaw = flawOf(shares)) {
-        throw Flaw(*flaw);
-    }
-    return shares;
-}
-
-Json::Value parseJson(std::string_view text) {
+Result<Json::Value> parseJson(std::string_view text) {
     Json::CharReaderBuilder builder;
     Json::CharReaderBuilder::strictMode(&builder.settings_);
     const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
     Json::Value root;
     std::string errors;
-    if (!reader->parse(text.data(), text.data() + text.size(), &root, &errors)) {
-        std::replace(errors.begin(), errors.end(), '\n', ' ');
-        throw Flaw("no valid JSON: " + plainText(errors, 300));
+    try {
+        if (reader->parse(text.data(), text.data() + text.size(), &root, &errors)) {
+            return root;
+        }
+    } catch (const Json::Exception& tooDeep) {
+        errors = tooDeep.what();
     }
-    return root;
+    std::replace(errors.begin(), errors.end(), '\n', ' ');
+    return damaged("no valid JSON: " + plainText(errors, 300));
 }
 
-Json::Value grantsValue(const std::map<std::string, ShareGrant>& grants) {
+/// Reads the members of a JSON object and keeps the first mistake; what is read after it means nothing.
+class Members {
+public:
+    Members(const Json::Value& object, std::string name) : object_(object), name_(std::move(name)) {
+        expect(object.isObject(), "is no object");
+    }
+
+    void expectOnly(std::initializer_list<std::string_view> keys) {
+        for (const std::string& key : good() ? object_.getMemberNames() : Json::Value::Members()) {
+            expect(std::ranges::find(keys, key) != keys.end(),
+                   "has the unknown key \"" + plainText(key, 80) + "\"");
+        }
+    }
+    std::string text(const char* key) {
+        const Json::Value& value = at(key);
+        expect(value.isString(), "has no text \"" + std::string(key) + "\"");
+        return good() ? value.asString() : "";
+    }
+    std::string optionalText(const char* key) { return has(key) ? text(key) : ""; }
+    bool truth(const char* key) {
+        if (!has(key)) {
+            return false;
+        }
+        expect(at(key).isBool(), "has \"" + std::string(key) + "\" that is neither true nor false");
+        return good() && at(key).asBool();
+    }
+    std::map<std::string, Access> grants(const char* key);
+
+    Result<> result() const { return good() ? Result<>() : damaged(name_ + " " + mistake_); }
+
+private:
+    bool good() const { return mistake_.empty(); }
+    bool has(const char* key) const { return good() && object_.isMember(key); }
+    const Json::Value& at(const char* key) const {
+        return good() ? object_[key] : Json::Value::nullSingleton();
+    }
+    void expect(bool asItShould, const std::string& mistake) {
+        if (good() && !asItShould) {
+            mistake_ = mistake;
+        }
+    }
+
+    const Json::Value& object_;
+    std::string name_;
+    std::string mistake_;
+};
+
+std::map<std::string, Access> Members::grants(const char* key) {
+    std::map<std::string, Access> grants;
+    if (!has(key)) {
+        return grants;
+    }
+    const Json::Value& entries = at(key);
+    expect(entries.isObject(), "has \"" + std::string(key) + "\" that is no object");
+    for (const std::string& account : good() ? entries.getMemberNames() : Json::Value::Members()) {
+        const Json::Value& value = entries[account];
+        const auto* const word = std::ranges::find(accessWords, value.isString() ? value.asString() : "");
+        expect(word != accessWords.end(), "grants \"" + plainText(account, 80) +
+                                              "\" something other than \"none\", \"read\" or \"write\"");
+        grants.emplace(account, static_cast<Access>(word - accessWords.begin()));
+    }
+    return grants;
+}
+
+Result<ShareEntry> shareOf(const Json::Value& object, std::size_t number) {
+    Members members(object, "share " + std::to_string(number));
+    members.expectOnly({"name", "comment", "path", "ftp", "users", "groups"});
+    ShareEntry share;
+    share.name = members.text("name");
+    share.path = members.text("path");
+    share.comment = members.optionalText("comment");
+    share.offeredToFtp = members.truth("ftp");
+    share.users = members.grants("users");
+    share.groups = members.grants("groups");
+    const Result<> read = members.result();
+    return read ? Result<ShareEntry>(std::move(share)) : read.error();
+}
+
+Result<> checkRoot(const Json::Value& root) {
+    if (!root.isObject()) {
+        return damaged("the file is no object");
+    }
+    if (!root["version"].isInt() || root["version"].asInt() != formVersion) {
+        return damaged("\"version\" is not 1");
+    }
+    if (!root["shares"].isArray()) {
+        return damaged("\"shares\" is no array");
+    }
+    Members members(root, "the file");
+    members.expectOnly({"version", "shares"});
+    return members.result();
+}
+
+Json::Value grantsValue(const std::map<std::string, Access>& grants) {
     Json::Value object(Json::objectValue);
-    for (const auto& [account, grant] : grants) {
-        object[account] = grantWords[static_cast<std::size_t>(grant)].word;
+    for (const auto& [account, access] : grants) {
+        object[account] = accessWords.at(static_cast<std::size_t>(access));
     }
     return object;
 }
 
 } // namespace
 
-std::optional<std::vector<ShareEntry>> parseShares(std::string_view text, std::string& flaw) {
-    // The JSON library throws, too, when values are nested too deep.
-    try {
-        return sharesOf(parseJson(text));
-    } catch (const std::exception& problem) {
-        flaw = problem.what();
-        return std::nullopt;
+Result<std::vector<ShareEntry>> parseShares(std::string_view text) {
+    const Result<Json::Value> root = parseJson(text);
+    if (!root) {
+        return root.error();
     }
+    if (const Result<> good = checkRoot(*root); !good) {
+        return good.error();
+    }
+    std::vector<ShareEntry> shares;
+    for (const Json::Value& object : (*root)["shares"]) {
+        auto share = shareOf(object, shares.size() + 1);
+        if (!share) {
+            return share.error();
+        }
+        shares.push_back(std::move(*share));
+    }
+    if (const Result<> good = checkShares(shares); !good) {
+        return damaged(good.error().message);
+    }
+    return shares;
 }
 
 std::string renderShares(const std::vector<ShareEntry>& shares) {

@@ -2,25 +2,20 @@
 #ifndef VELT_STANDALONE_SHARES_SHARE_FILE_H
 #define VELT_STANDALONE_SHARES_SHARE_FILE_H
 
-#include "standalone/shares/share_store.h"
+#include "standalone/shares/share.h"
 
-#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
 namespace velt {
 
-/// Why these cannot be the shares of a server, in words that follow a colon ("share 2 (\"a/b\") ...");
-/// nothing when they can.
-std::optional<std::string> flawOf(const std::vector<ShareEntry>& shares);
+/// Reads the text of the shares' file: JSON in its strict form, the keys as renderShares writes them, of
+/// which "comment", "ftp", "users" and "groups" may be absent. The error of a damaged one names the file and
+/// what is wrong in it.
+Result<std::vector<ShareEntry>> parseShares(std::string_view text);
 
-/// Reads the file's text: JSON in its strict form, the keys as renderShares writes them, of which "comment",
-/// "ftp", "users" and "groups" may be absent. Nothing when the text does not have this form; `flaw` then says
-/// why, as above.
-std::optional<std::vector<ShareEntry>> parseShares(std::string_view text, std::string& flaw);
-
-/// The text of shares that have no flaw.
+/// The text of shares that checkShares has passed.
 std::string renderShares(const std::vector<ShareEntry>& shares);
 
 } // namespace velt

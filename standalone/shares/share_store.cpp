@@ -2,9 +2,8 @@
 
 #include "base/file.h"
 #include "base/file_stamp.h"
-#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -29,26 +28,17 @@ Cache& cache() {
     return instance;
 }
 
-std::optional<std::vector<ShareEntry>> readShares(const std::filesystem::path& path) {
+Result<std::vector<ShareEntry>> readShares(const std::filesystem::path& path) {
     const auto text = readOptionalFile(path);
     if (!text) {
-        fail(text.error());
-        return std::nullopt;
+        return text.error();
     }
-    if (!*text) {
-        return std::vector<ShareEntry>{};
-    }
-    std::string flaw;
-    std::optional<std::vector<ShareEntry>> shares = parseShares(**text, flaw);
-    if (!shares) {
-        fail(ErrorNumber::damaged, path.string() + " is damaged: " + flaw + ".");
-    }
-    return shares;
+    return *text ? parseShares(**text) : std::vector<ShareEntry>();
 }
 
 } // namespace
 
-std::optional<std::vector<ShareEntry>> allShares() {
+Result<std::vector<ShareEntry>> loadShares() {
     const std::filesystem::path path = statePath(paths::shares);
     Cache& known = cache();
     const std::lock_guard lock(known.mutex);
@@ -56,7 +46,7 @@ std::optional<std::vector<ShareEntry>> allShares() {
     if (path == known.path && stamp == known.stamp) {
         return known.shares;
     }
-    std::optional<std::vector<ShareEntry>> shares = readShares(path);
+    auto shares = readShares(path);
     if (shares) {
         known.path = path;
         known.stamp = stamp;
@@ -65,17 +55,16 @@ std::optional<std::vector<ShareEntry>> allShares() {
     return shares;
 }
 
-int saveShares(const std::vector<ShareEntry>& shares) {
-    if (const std::optional<std::string> flaw = flawOf(shares)) {
-        return fail(ErrorNumber::invalid, "The shares cannot be stored: " + *flaw + ".");
+Result<> storeShares(const std::vector<ShareEntry>& shares) {
+    if (const Result<> good = checkShares(shares); !good) {
+        return Error(ErrorNumber::invalid, "The shares cannot be stored: " + good.error().message + ".");
     }
-    const StateLock lock;
+    const auto lock = StateLock::take();
     if (!lock) {
-        return -1;
+        return lock.error();
     }
-    return toContract(perform(Effect::store, "shares", [&shares] {
-        return replaceFile(statePath(paths::shares), renderShares(shares), 0644);
-    }));
+    return perform(Effect::store, "shares",
+                   [&shares] { return replaceFile(statePath(paths::shares), renderShares(shares), 0644); });
 }
 
 } // namespace velt

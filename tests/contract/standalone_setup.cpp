@@ -43,15 +43,15 @@ void prepareAccounts(const World& world) {
     velt::setAccountSources(sources);
 }
 
-int prepareShares(const World& world) {
+velt::Result<> prepareShares(const World& world) {
     std::vector<velt::ShareEntry> shares;
     for (const Share& share : world.shares) {
         std::filesystem::create_directories(folderOf(share.name));
-        const auto grant = share.ftpReachesIt ? velt::ShareGrant::write : velt::ShareGrant::none;
+        const auto grant = share.ftpReachesIt ? velt::Access::write : velt::Access::none;
         shares.push_back(
             {share.name, share.comment, folderOf(share.name), share.offeredToFtp, {{"ftp", grant}}, {}});
     }
-    return velt::saveShares(shares);
+    return velt::storeShares(shares);
 }
 
 } // namespace
@@ -62,8 +62,11 @@ void prepare(const World& world) {
     ::chmod(root()->path().c_str(), 0755);
     ::setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
     prepareAccounts(world);
-    if (velt::openState(root()->path()) < 0 || prepareShares(world) < 0) {
+    if (velt::openState(root()->path()) < 0) {
         throw std::runtime_error(velt::lastErrorSentence());
+    }
+    if (const auto stored = prepareShares(world); !stored) {
+        throw std::runtime_error(stored.error().message);
     }
     velt::clearLastError();
 }

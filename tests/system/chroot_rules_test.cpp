@@ -2,6 +2,7 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/core/last_error.h"
+#include "tests/support/result.h"
 
 #include <sys/stat.h>
 
@@ -18,7 +19,7 @@ protected:
         if (IsSkipped() || HasFatalFailure()) {
             return;
         }
-        const auto music = addShare("music", "music", ShareGrant::none);
+        const auto music = addShare("music", "music", Access::none);
         fs::create_directory(music / "below");
         fs::create_directory(music / "odd \"#\\ %{env:HOME} ~");
         fs::create_directory(music / "%u");
@@ -44,22 +45,22 @@ protected:
 TEST_F(ChrootRules, confineAUserToAFolderOfAShare) {
     start();
     EXPECT_EQ(rootOf("alice"), home);
-    saveRules({"u:1001:/music/below"});
+    storeRules({"u:1001:/music/below"});
     EXPECT_EQ(rootOf("alice"), "deep\r\n") << "without a restart";
     EXPECT_EQ(rootOf("bob"), home);
-    saveRules({});
+    storeRules({});
     EXPECT_EQ(rootOf("alice"), home);
 }
 
 TEST_F(ChrootRules, confineToAShareAsAWhole) {
     start();
-    saveRules({"u:1003:/music"});
+    storeRules({"u:1003:/music"});
     EXPECT_NE(rootOf("carol").find("song"), std::string::npos);
 }
 
 TEST_F(ChrootRules, ofAGroupHoldForItsMembers) {
     start();
-    saveRules({"g:2001:/music/below"});
+    storeRules({"g:2001:/music/below"});
     EXPECT_EQ(rootOf("alice"), "deep\r\n");
     EXPECT_EQ(rootOf("bob"), "deep\r\n");
     EXPECT_EQ(rootOf("carol"), home);
@@ -67,20 +68,20 @@ TEST_F(ChrootRules, ofAGroupHoldForItsMembers) {
 
 TEST_F(ChrootRules, ofAPrimaryGroupHoldToo) {
     start();
-    saveRules({"g:1003:/music/below"});
+    storeRules({"g:1003:/music/below"});
     EXPECT_EQ(rootOf("carol"), "deep\r\n");
 }
 
 TEST_F(ChrootRules, ofAUserComeBeforeThoseOfAGroup) {
     start();
-    saveRules({"g:2001:/music/below", "u:1001:/home"});
+    storeRules({"g:2001:/music/below", "u:1001:/home"});
     EXPECT_EQ(rootOf("alice"), home);
     EXPECT_EQ(rootOf("bob"), "deep\r\n");
 }
 
 TEST_F(ChrootRules, holdInStoredOrder) {
     start();
-    saveRules({"g:1001:/home", "g:2001:/music/below", "u:1002:/music/below", "u:1002:/home"});
+    storeRules({"g:1001:/home", "g:2001:/music/below", "u:1002:/music/below", "u:1002:/home"});
     EXPECT_EQ(rootOf("alice"), home);
     EXPECT_EQ(rootOf("bob"), "deep\r\n");
 }
@@ -88,7 +89,7 @@ TEST_F(ChrootRules, holdInStoredOrder) {
 TEST_F(ChrootRules, comeBeforeTheGeneralSetting) {
     record.user_chroot = 0;
     start();
-    saveRules({"u:1001:/home", "u:1002:/music/below"});
+    storeRules({"u:1001:/home", "u:1002:/music/below"});
     EXPECT_EQ(rootOf("alice"), home);
     EXPECT_EQ(rootOf("bob"), "deep\r\n");
     EXPECT_EQ(rootOf("carol"), "music\r\n");
@@ -108,18 +109,18 @@ TEST_F(ChrootRules, madeThroughTheUserListHoldToo) {
 
 TEST_F(ChrootRules, withSpecialCharactersNameThatFolderAndNoOther) {
     start();
-    saveRules({"u:1001:/music/odd \"#\\ %{env:HOME} ~"});
+    storeRules({"u:1001:/music/odd \"#\\ %{env:HOME} ~"});
     EXPECT_EQ(rootOf("alice"), "odd\r\n");
     fs::create_directory("/mnt/srv/music/alice");
     writeFile("/mnt/srv/music/alice/wrong", "");
     writeFile("/mnt/srv/music/%u/right", "");
-    saveRules({"u:1001:/music/%u"});
+    storeRules({"u:1001:/music/%u"});
     EXPECT_EQ(rootOf("alice"), "right\r\n") << "the daemon does not put the name in its place";
 }
 
 TEST_F(ChrootRules, refuseTheLoginWithoutTheirFolder) {
     start();
-    saveRules({"u:1001:/music/absent", "u:1002:/absent", "u:1003:/music/song"});
+    storeRules({"u:1001:/music/absent", "u:1002:/absent", "u:1003:/music/song"});
     EXPECT_EQ(rootOf("alice"), "530");
     EXPECT_EQ(rootOf("bob"), "530");
     EXPECT_EQ(rootOf("carol"), "530") << "a file is no folder";
@@ -130,7 +131,7 @@ TEST_F(ChrootRules, refuseAFolderThatLeadsOutOfItsShare) {
     fs::create_directory_symlink("/etc", "/mnt/srv/music/trap");
     fs::create_directory_symlink("below", "/mnt/srv/music/alias");
     fs::create_directory_symlink("../../home", "/mnt/srv/music/upwards");
-    saveRules({"u:1001:/music/trap", "u:1002:/music/alias", "u:1003:/music/upwards/carol"});
+    storeRules({"u:1001:/music/trap", "u:1002:/music/alias", "u:1003:/music/upwards/carol"});
     EXPECT_EQ(rootOf("alice"), "530");
     EXPECT_EQ(rootOf("bob"), "deep\r\n");
     EXPECT_EQ(rootOf("carol"), "530");
@@ -164,7 +165,7 @@ TEST_F(ChrootRules, refuseAllLoginsWithADamagedFile) {
 
 TEST_F(ChrootRules, ofAFailedLoginDoNotReachTheNextOne) {
     start();
-    saveRules({"u:1001:/music/below"});
+    storeRules({"u:1001:/music/below"});
     FtpSession session(port);
     EXPECT_EQ(session.logIn("alice", "wrong"), 530);
     ASSERT_EQ(session.logIn("bob"), 230);
@@ -178,7 +179,7 @@ TEST_F(ChrootRules, ofAFailedLoginDoNotReachTheNextOne) {
 
 TEST_F(ChrootRules, doNotTellAStrangerWhoHasOne) {
     start();
-    saveRules({"u:1001:/music/absent"});
+    storeRules({"u:1001:/music/absent"});
     FtpSession session(port);
     session.command("USER alice");
     const Reply ruled = session.command("PASS wrong");
@@ -189,36 +190,36 @@ TEST_F(ChrootRules, doNotTellAStrangerWhoHasOne) {
 }
 
 TEST_F(ChrootRules, doNotConcernAnonymousUsers) {
-    addShare("public", "public", ShareGrant::read);
+    addShare("public", "public", Access::read);
     letAnonymousIn("public");
     start();
-    saveRules({"u:104:/music/absent"});
+    storeRules({"u:104:/music/absent"});
     FtpSession session(port);
     EXPECT_EQ(session.logIn("anonymous", ""), 230);
 }
 
 TEST_F(ChrootRules, findAShareThatIsMadeLater) {
     start();
-    saveRules({"u:1001:/later"});
+    storeRules({"u:1001:/later"});
     EXPECT_EQ(rootOf("alice"), "530");
-    writeFile(addShare("later", "later", ShareGrant::none) / "file", "x");
+    writeFile(addShare("later", "later", Access::none) / "file", "x");
     EXPECT_EQ(rootOf("alice"), "file\r\n");
 }
 
 TEST_F(ChrootRules, followAShareThatIsMovedOrRemoved) {
-    writeFile(addShare("moving", "before", ShareGrant::none) / "old", "x");
+    writeFile(addShare("moving", "before", Access::none) / "old", "x");
     start();
-    saveRules({"u:1001:/moving"});
+    storeRules({"u:1001:/moving"});
     EXPECT_EQ(rootOf("alice"), "old\r\n");
-    auto shares = allShares();
+    auto shares = loadShares();
     ASSERT_TRUE(shares);
     shares->back().path = "/mnt/srv/after";
     fs::create_directories("/mnt/srv/after");
     writeFile("/mnt/srv/after/new", "x");
-    ASSERT_EQ(saveShares(*shares), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(storeShares(*shares)), "");
     EXPECT_EQ(rootOf("alice"), "new\r\n");
     shares->pop_back();
-    ASSERT_EQ(saveShares(*shares), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(storeShares(*shares)), "");
     EXPECT_EQ(rootOf("alice"), "530");
 }
 

@@ -2,6 +2,8 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/core/last_error.h"
+#include "tests/support/result.h"
+#include "tests/system/support/running_program.h"
 
 #include <filesystem>
 
@@ -44,9 +46,9 @@ TEST_F(FtpService, wrongPasswordIsRefused) {
 }
 
 TEST_F(FtpService, unconfinedUsersSeeTheOfferedSharesSideBySide) {
-    writeFile(addShare("music", "a/music", ShareGrant::none) / "song", "la");
-    writeFile(addShare("odd \"name\" #%{env:HOME} ä", "b", ShareGrant::none) / "file", "odd");
-    addShare("secret", "c", ShareGrant::none, false);
+    writeFile(addShare("music", "a/music", Access::none) / "song", "la");
+    writeFile(addShare("odd \"name\" #%{env:HOME} ä", "b", Access::none) / "file", "odd");
+    addShare("secret", "c", Access::none, false);
     record.user_chroot = 0;
     start();
     FtpSession session(port);
@@ -64,7 +66,7 @@ TEST_F(FtpService, unconfinedUsersSeeTheOfferedSharesSideBySide) {
 }
 
 TEST_F(FtpService, aShareThatStartsWithDotsIsShown) {
-    writeFile(addShare("..data", "dots", ShareGrant::none) / "file", "dotted");
+    writeFile(addShare("..data", "dots", Access::none) / "file", "dotted");
     record.user_chroot = 0;
     start();
     FtpSession session(port);
@@ -73,13 +75,23 @@ TEST_F(FtpService, aShareThatStartsWithDotsIsShown) {
 }
 
 TEST_F(FtpService, aShareThatCannotBeMountedIsLeftOut) {
-    writeFile(addShare("music", "music", ShareGrant::none) / "song", "la");
-    // A folder of another mount name space can be seen there, and not be mounted.
-    auto shares = allShares();
+    writeFile(addShare("music", "music", Access::none) / "song", "la");
+    // A folder of another mount namespace can be opened there, and not be mounted.
+    const std::vector<std::string> asAlice = {"/usr/bin/setpriv", "--reuid=1001", "--regid=1001",
+                                              "--clear-groups"};
+    std::vector<std::string> sleeper = {"/usr/bin/unshare", "--mount"};
+    sleeper.insert(sleeper.end(), asAlice.begin(), asAlice.end());
+    sleeper.insert(sleeper.end(), {"/bin/sh", "-c", "echo ready; exec /bin/sleep 60"});
+    auto elsewhere = RunningProgram::start(sleeper, {}, "/dev/null");
+    ASSERT_EQ(elsewhere.readUntil("ready\n"), "ready\n");
+    const std::string folder = "/proc/" + std::to_string(elsewhere.pid()) + "/root/usr";
+    std::vector<std::string> look = asAlice;
+    look.insert(look.end(), {"/usr/bin/test", "-r", folder});
+    ASSERT_EQ(runProcess(look).exitCode, 0) << "alice can open it";
+    auto shares = loadShares();
     ASSERT_TRUE(shares);
-    shares->push_back({"stubborn", "", "/proc/1/root/usr", true, {}, {}});
-    ASSERT_TRUE(fs::is_directory(shares->back().path));
-    ASSERT_EQ(saveShares(*shares), 0) << lastErrorSentence();
+    shares->push_back({"stubborn", "", folder, true, {{"alice", Access::read}}, {}});
+    ASSERT_EQ(messageOf(storeShares(*shares)), "");
     record.user_chroot = 0;
     start();
     FtpSession session(port);
@@ -95,8 +107,8 @@ TEST_F(FtpService, anonymousUsersAreRefusedByDefault) {
 }
 
 TEST_F(FtpService, anonymousUsersAreConfinedToTheirShare) {
-    writeFile(addShare("public", "pub \"x\" %{env:HOME}", ShareGrant::read) / "notice", "hello");
-    addShare("music", "music", ShareGrant::write);
+    writeFile(addShare("public", "pub \"x\" %{env:HOME}", Access::read) / "notice", "hello");
+    addShare("music", "music", Access::write);
     letAnonymousIn("public");
     start();
     for (const char* user : {"anonymous", "ftp"}) {
@@ -112,7 +124,7 @@ TEST_F(FtpService, anonymousUsersAreConfinedToTheirShare) {
 }
 
 TEST_F(FtpService, anonymousUsersWriteWhereThatIsGranted) {
-    const auto folder = addShare("public", "public", ShareGrant::write);
+    const auto folder = addShare("public", "public", Access::write);
     letAnonymousIn("public");
     start();
     FtpSession session(port);
@@ -122,7 +134,7 @@ TEST_F(FtpService, anonymousUsersWriteWhereThatIsGranted) {
 }
 
 TEST_F(FtpService, anonymousUsersAreRefusedWithoutTheirShare) {
-    addShare("closed", "closed", ShareGrant::none);
+    addShare("closed", "closed", Access::none);
     for (const char* share : {"closed", "absent"}) {
         letAnonymousIn(share);
         start();
@@ -132,9 +144,9 @@ TEST_F(FtpService, anonymousUsersAreRefusedWithoutTheirShare) {
 }
 
 TEST_F(FtpService, unconfinedAnonymousUsersSeeTheSharesTheyMayReach) {
-    writeFile(addShare("readable", "r", ShareGrant::read) / "file", "r");
-    addShare("writable", "w", ShareGrant::write);
-    addShare("closed", "c", ShareGrant::none);
+    writeFile(addShare("readable", "r", Access::read) / "file", "r");
+    addShare("writable", "w", Access::write);
+    addShare("closed", "c", Access::none);
     letAnonymousIn();
     start();
     FtpSession session(port);
@@ -149,7 +161,7 @@ TEST_F(FtpService, unconfinedAnonymousUsersSeeTheSharesTheyMayReach) {
 }
 
 TEST_F(FtpService, confinedUsersDoNotSeeTheSharesOfAnonymousOnes) {
-    addShare("readable", "r", ShareGrant::read);
+    addShare("readable", "r", Access::read);
     letAnonymousIn();
     start();
     FtpSession session(port);

@@ -7,9 +7,9 @@ namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
 
-constexpr auto none = ShareGrant::none;
-constexpr auto read = ShareGrant::read;
-constexpr auto write = ShareGrant::write;
+constexpr auto none = Access::none;
+constexpr auto read = Access::read;
+constexpr auto write = Access::write;
 
 class ShareGrants : public SharedFolders {};
 
@@ -178,18 +178,18 @@ TEST_F(ShareGrants, holdForRules) {
     fs::permissions(readable / "below", fs::perms(0777));
     writeFile(readable / "below/file", "deep");
     start();
-    saveRules({"u:1001:/ro/below", "u:1002:/no", "u:1003:/no"});
+    storeRules({"u:1001:/ro/below", "u:1002:/no", "u:1003:/no"});
     EXPECT_EQ(accessOf("alice", ""), "read");
     EXPECT_EQ(accessOf("bob", ""), "write") << "a rule may name a share that is not offered";
     EXPECT_EQ(seenBy("carol"), "530");
-    saveRules({"u:1001:/no"});
+    storeRules({"u:1001:/no"});
     EXPECT_EQ(seenBy("alice"), "530");
 }
 
 TEST_F(ShareGrants, refuseInTheWordsOfAWrongPassword) {
     share("no", {{"alice", none}});
     start();
-    saveRules({"u:1001:/no"});
+    storeRules({"u:1001:/no"});
     FtpSession session(port);
     session.command("USER alice");
     const Reply refused = session.command("PASS alice-secret");
@@ -229,7 +229,7 @@ TEST_F(ShareGrants, ofAnInnerShareTakeFromThoseOfAnOuterOne) {
     EXPECT_EQ(accessOf("alice", "/under-no"), "write");
     EXPECT_EQ(accessOf("bob", "/outer/a/ro"), "read");
     EXPECT_EQ(accessOf("bob", "/inner-ro"), "write");
-    saveRules({"u:1001:/outer/a/ro", "u:1002:/outer/a/no"});
+    storeRules({"u:1001:/outer/a/ro", "u:1002:/outer/a/no"});
     EXPECT_EQ(accessOf("alice", ""), "read") << "a rule leads no way around";
     EXPECT_EQ(seenBy("bob"), "530");
 }

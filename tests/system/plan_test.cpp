@@ -40,7 +40,7 @@ TEST_F(FtpPlan, namesTheDaemonAndItsPort) {
 TEST_F(FtpPlan, staysTheSameWhileNothingChanges) {
     offerTls(true);
     record.user_chroot = 0;
-    addShare("music", "music", ShareGrant::read);
+    addShare("music", "music", Access::read);
     EXPECT_EQ(hash(), hash());
 }
 
@@ -69,11 +69,11 @@ TEST_F(FtpPlan, changesWithWhatADaemonReadsAtItsStart) {
 
 TEST_F(FtpPlan, doesNotChangeWithWhatIsReadAtLogins) {
     record.user_chroot = 0;
-    addShare("music", "music", ShareGrant::none);
+    addShare("music", "music", Access::none);
     const std::string before = hash();
-    saveRules({"u:1001:/music"});
+    storeRules({"u:1001:/music"});
     EXPECT_EQ(hash(), before);
-    addShare("films", "films", ShareGrant::none);
+    addShare("films", "films", Access::none);
     EXPECT_EQ(hash(), before);
 }
 
@@ -107,8 +107,8 @@ TEST_F(FtpPlan, isRefusedWhereSessionsCannotHaveMountsOfTheirOwn) {
 }
 
 TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {
-    addShare("one", "one", ShareGrant::read);
-    addShare("two", "two", ShareGrant::read);
+    addShare("one", "one", Access::read);
+    addShare("two", "two", Access::read);
     letAnonymousIn("one");
     hash();
     const auto former = planFtpDaemon();
@@ -140,8 +140,8 @@ TEST_F(FtpPlan, writesNothingWhenTheDaemonRefusesTheNewConfiguration) {
 }
 
 TEST_F(FtpPlan, leavesAStoredRuleSetAlone) {
-    addShare("music", "music", ShareGrant::none);
-    saveRules({"u:1001:/music"});
+    addShare("music", "music", Access::none);
+    storeRules({"u:1001:/music"});
     hash();
     EXPECT_EQ(readFileText(worldRoot / "etc/velt/chroot_rules"), "velt-chroot-rules 1\nu:1001:/music\n");
     EXPECT_EQ(modeOf(worldRoot / "etc/velt/chroot_rules"), 0600U);

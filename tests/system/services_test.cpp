@@ -112,11 +112,11 @@ TEST_F(ControlledServices, aKilledFtpDaemonIsUpAgainWithinTwoSeconds) {
 }
 
 TEST_F(ControlledServices, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
-    addShare("music", "music", ShareGrant::none);
+    addShare("music", "music", Access::none);
     record.user_chroot = 0;
     storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
     const ProcessId daemon = serviceState("ftpd").daemon;
-    addShare("films", "films", ShareGrant::none);
+    addShare("films", "films", Access::none);
     std::strcpy(record.portnum, "2123");
     ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
     {
@@ -134,7 +134,7 @@ TEST_F(ControlledServices, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
 }
 
 TEST_F(ControlledServices, unconfinedUsersHaveTheirShareRootThroughTheSupervisor) {
-    addShare("music", "music", ShareGrant::none);
+    addShare("music", "music", Access::none);
     record.user_chroot = 0;
     storeAndStart(VELT_FTP_SERVICE_PLAIN, 2121);
     EXPECT_TRUE(isServing(serviceState("ftpd")));

@@ -12,8 +12,8 @@ namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
 
-constexpr auto read = ShareGrant::read;
-constexpr auto write = ShareGrant::write;
+constexpr auto read = Access::read;
+constexpr auto write = Access::write;
 
 class SessionMounts : public SharedFolders {};
 
@@ -67,7 +67,7 @@ TEST_F(SessionMounts, areOfTheRightFolderWhileSomebodyMovesIt) {
     fs::create_directory("/mnt/srv/outside");
     writeFile("/mnt/srv/outside/wrong", "x");
     start();
-    saveRules({"u:1001:/music/mine"});
+    storeRules({"u:1001:/music/mine"});
     std::atomic<bool> done = false;
     // Each moment there stands either the folder or a link that leads out.
     std::thread mover([&] {
@@ -98,7 +98,7 @@ TEST_F(SessionMounts, areOfNoClosedFolderWhileSomebodyMovesAShare) {
     writeFile("/mnt/closed/open/wrong", "x");
     fs::permissions("/mnt/closed", fs::perms(0700));
     start();
-    saveRules({"u:1001:/inner"});
+    storeRules({"u:1001:/inner"});
     std::atomic<bool> done = false;
     // Each moment there stands either the folder or a link to one that alice cannot get to.
     std::thread mover([&] {

@@ -4,6 +4,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/process/run_program.h"
 #include "standalone/rules/rule_store.h"
+#include "tests/support/result.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/ftp_service.h"
 #include "tests/system/support/private_world.h"
@@ -125,9 +126,9 @@ TEST_F(SftpService, goesByTheRightsOfTheFileSystemAlone) {
     writeFile("/mnt/srv/share/open", "for all");
     writeFile("/mnt/srv/share/own", "for root");
     fs::permissions("/mnt/srv/share/own", fs::perms(0600));
-    const ShareEntry share{"share", "", "/mnt/srv/share", true, {{"alice", ShareGrant::none}}, {}};
-    ASSERT_EQ(saveShares({share}), 0) << lastErrorSentence();
-    ASSERT_EQ(velt::saveRules({{true, aliceId, "/home"}}), 0) << lastErrorSentence();
+    const ShareEntry share{"share", "", "/mnt/srv/share", true, {{"alice", Access::none}}, {}};
+    ASSERT_EQ(messageOf(storeShares({share})), "");
+    ASSERT_EQ(messageOf(velt::storeRules({{true, aliceId, "/home"}})), "");
     start(port);
     EXPECT_EQ(sftp("get /mnt/srv/share/open /mnt/got\n").exitCode, 0);
     EXPECT_EQ(readFileText("/mnt/got"), "for all");

@@ -7,6 +7,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/shares/share_store.h"
 #include "standalone/standalone.h"
+#include "tests/support/result.h"
 #include "tests/system/support/systemd_services.h"
 
 #include <csignal>
@@ -175,8 +176,8 @@ TEST_F(UnderSystemd, theShareRootIsTheDaemonsOwn) {
         openMachine();
         fs::create_directories("/srv/music");
         std::ofstream("/srv/music/about") << "music";
-        ASSERT_EQ(saveShares({{"music", "", "/srv/music", true, {{"alice", ShareGrant::read}}, {}}}), 0)
-            << lastErrorSentence();
+        ASSERT_EQ(messageOf(storeShares({{"music", "", "/srv/music", true, {{"alice", Access::read}}, {}}})),
+                  "");
         const std::string mounts = textOf("/proc/1/mounts");
         storeFtp(plain, 21, false);
         ASSERT_EQ(VLIBServiceStart("ftpd", 0), 0) << lastErrorSentence();

@@ -41,7 +41,11 @@ int checkAnonymousAccount() {
 // Logins follow the shares that are stored then. That these cannot be read is better said at once.
 int surveyShares(const FtpSettings& settings) {
     const auto& record = settings.record;
-    return (record.anonymous == 0 && record.user_chroot != 0) || allShares() ? 0 : -1;
+    if (record.anonymous == 0 && record.user_chroot != 0) {
+        return 0;
+    }
+    const auto shares = loadShares();
+    return shares ? 0 : fail(shares.error());
 }
 
 int surveyCertificate(FtpSurroundings& found) {

@@ -58,7 +58,7 @@ std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
 
 int writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
     if (makeFolder(places.runFolder) < 0 || makeFolder(places.loginRoot) < 0 ||
-        makeFolder(places.anonymousShare.parent_path()) < 0 || makeRulesFile() < 0) {
+        makeFolder(places.anonymousShare.parent_path()) < 0 || toContract(makeRulesFile()) < 0) {
         return -1;
     }
     return confinesAnonymous(settings)
@@ -105,7 +105,7 @@ std::optional<DaemonPlan> planFtpDaemon() {
         return std::nullopt;
     }
     // Else the daemon would start well, and refuse every login.
-    if (!found->places.accountFiles && checkSessionMounts() < 0) {
+    if (!found->places.accountFiles && toContract(checkSessionMounts()) < 0) {
         return std::nullopt;
     }
     return writePlan(*settings, *found);

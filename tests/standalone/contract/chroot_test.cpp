@@ -6,6 +6,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/rules/rule_store.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
@@ -117,9 +118,9 @@ TEST_F(ChrootContract, aSystemAccountIsListedOnceItIsConfined) {
 }
 
 TEST_F(ChrootContract, addingTakesTheUserFromAShareAndLeavesGroupsAlone) {
-    ASSERT_EQ(
-        saveRules({{false, 1000, "/g"}, {true, 1000, "/share"}, {true, 1000, "/other"}, {true, 1001, "/b"}}),
-        0);
+    ASSERT_EQ(messageOf(storeRules(
+                  {{false, 1000, "/g"}, {true, 1000, "/share"}, {true, 1000, "/other"}, {true, 1001, "/b"}})),
+              "");
     EXPECT_EQ(chrootUsers(), Names());
     ASSERT_EQ(add({"ann"}), 0);
     EXPECT_EQ(loadRules(),

@@ -5,11 +5,14 @@
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_store.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
 namespace velt {
 namespace {
+
+using test::messageOf;
 
 constexpr int offeredToFtp = 0x207;
 
@@ -34,7 +37,7 @@ protected:
 };
 
 TEST_F(ShareContractTest, AShareHasItsThreeTexts) {
-    ASSERT_EQ(saveShares({{"public", "For all", "/srv/public", true, {}, {}}}), 0);
+    ASSERT_EQ(messageOf(storeShares({{"public", "For all", "/srv/public", true, {}, {}}})), "");
     VELT_SHARE* share = nullptr;
     ASSERT_EQ(VELTShareGet("public", &share), 0);
     EXPECT_STREQ(share->name, "public");
@@ -45,7 +48,7 @@ TEST_F(ShareContractTest, AShareHasItsThreeTexts) {
 }
 
 TEST_F(ShareContractTest, AnUnknownNameFailsAndLeavesTheHandleAlone) {
-    ASSERT_EQ(saveShares({{"public", "", "/srv/public", true, {}, {}}}), 0);
+    ASSERT_EQ(messageOf(storeShares({{"public", "", "/srv/public", true, {}, {}}})), "");
     for (const char* name : {"PUBLIC", "", "public/", "../public", "publi", "\xff", "a\nb"}) {
         VELT_SHARE* share = nullptr;
         EXPECT_LT(VELTShareGet(name, &share), 0) << name;
@@ -56,11 +59,11 @@ TEST_F(ShareContractTest, AnUnknownNameFailsAndLeavesTheHandleAlone) {
 }
 
 TEST_F(ShareContractTest, ListsWhatIsOfferedToFtpInTheOrderOfTheStore) {
-    ASSERT_EQ(saveShares({{"z", "", "/z", true, {}, {}},
-                          {"hidden", "", "/h", false, {}, {}},
-                          {"a", "", "/a", true, {}, {}},
-                          {"m", "", "/m", true, {}, {}}}),
-              0);
+    ASSERT_EQ(messageOf(storeShares({{"z", "", "/z", true, {}, {}},
+                                     {"hidden", "", "/h", false, {}, {}},
+                                     {"a", "", "/a", true, {}, {}},
+                                     {"m", "", "/m", true, {}, {}}})),
+              "");
     ASSERT_EQ(VELTFTPShareEnum(&list_, offeredToFtp), 0);
     EXPECT_EQ(listed(), (std::vector<std::string>{"z", "a", "m"}));
 }

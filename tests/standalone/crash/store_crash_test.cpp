@@ -91,7 +91,7 @@ private:
     VLIBCSzList* list_ = VLIBCSzListAlloc(8);
 };
 
-int saveRules(const std::vector<const char*>& lines) {
+int storeRules(const std::vector<const char*>& lines) {
     return VELTFTPChrootRuleSave(List(lines).get());
 }
 
@@ -112,12 +112,13 @@ int storeShares(const char* folder) {
     share.name = "public";
     share.path = folder;
     share.offeredToFtp = true;
-    share.users["ftp"] = ShareGrant::read;
-    return saveShares({share});
+    share.users["ftp"] = Access::read;
+    const auto stored = velt::storeShares({share});
+    return stored ? 0 : fail(stored.error());
 }
 
 std::string readShares() {
-    const auto shares = allShares();
+    const auto shares = loadShares();
     return shares && shares->size() == 1 ? shares->front().path : unreadable();
 }
 
@@ -198,19 +199,19 @@ const Store stores[] = {
     {"AnotherKeyOfTheSystem", [] { return VLIBCINFOSetKeyValue("a_key", "old"); },
      [] { return VLIBCINFOSetKeyValue("a_key", "a new one"); }, readSystemInformation},
     {"Sftp", [] { return VELTSFTPConfigSet(0, 22); }, [] { return VELTSFTPConfigSet(0, 2222); }, readSftp},
-    {"ChrootRules", [] { return saveRules({"u:1000:/home"}); },
+    {"ChrootRules", [] { return storeRules({"u:1000:/home"}); },
      [] {
-         return saveRules({"g:100:/public/below", "u:1001:/public"});
+         return storeRules({"g:100:/public/below", "u:1001:/public"});
      },
      readRules},
-    {"AnAddedChrootUser", [] { return saveRules({"u:1001:/public"}); },
+    {"AnAddedChrootUser", [] { return storeRules({"u:1001:/public"}); },
      [] {
          return VELTFTPAddChrootUser(List({"ann", "ben"}).get());
      },
      readRules},
     {"ADeletedChrootUser",
      [] {
-         return saveRules({"u:1000:/home", "u:1001:/public"});
+         return storeRules({"u:1000:/home", "u:1001:/public"});
      },
      [] { return VELTFTPDeleteChrootUser(List({"ann"}).get()); }, readRules},
     {"ARunKey", [] { return VLIBServicecfgRunKeySet("ftpd", 1); },

@@ -155,12 +155,13 @@ int storeShare(const std::string& name, const std::string& comment, const std::s
     share.name = name;
     share.comment = comment;
     share.path = path;
-    share.users[user] = ShareGrant::read;
-    return saveShares({share});
+    share.users[user] = Access::read;
+    const auto stored = storeShares({share});
+    return stored ? 0 : fail(stored.error());
 }
 
 template<class Part> Text readShare(Part part) {
-    const auto shares = allShares();
+    const auto shares = loadShares();
     return shares && shares->size() == 1 ? Text(part(shares->front())) : Text();
 }
 
@@ -270,8 +271,8 @@ protected:
         ASSERT_GE(VELTFTPChrootRuleEnum(&rules.get()), 0) << lastErrorSentence();
         ASSERT_EQ(rules.get()->count, 2);
         EXPECT_STREQ(VLIBCSzListGet(rules.get(), 0), rule);
-        const auto shares = allShares();
-        ASSERT_TRUE(shares) << lastErrorSentence();
+        const auto shares = loadShares();
+        ASSERT_TRUE(shares) << shares.error().message;
         EXPECT_EQ(shares->size(), 1U);
     }
 

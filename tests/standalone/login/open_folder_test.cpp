@@ -23,18 +23,16 @@ protected:
         chmod(root_.path().c_str(), 0755);
         fs::create_directories(share_ / "below/deep");
         fs::create_directories(root_.path() / "outside");
-        login_.uid = 54321;
-        login_.gids = {54322, 54323};
     }
     std::string below(const fs::path& path) {
-        const UniqueFd share = openFolder(share_);
-        const UniqueFd folder = openFolderBelow(login_, share, path);
-        return folder ? placeOf(folder).lexically_relative(share_) : fs::path("(refused)");
+        const auto share = openFolder(share_);
+        const auto folder = openFolderBelow(user_, *share, path);
+        return folder ? placeOf(*folder)->lexically_relative(share_) : fs::path("(refused)");
     }
 
     TemporaryFolder root_;
     const fs::path share_ = fs::canonical(root_.path()) / "share";
-    Login login_;
+    Identity user_{"", 54321, {54322, 54323}};
 };
 
 TEST_F(OpenFolder, belowLeadsToFoldersInIt) {
@@ -64,28 +62,28 @@ TEST_F(OpenFolder, belowHasTheRightsOfTheLogin) {
     ASSERT_EQ(chown((share_ / "below").c_str(), 54321, 0), 0);
     fs::permissions(share_ / "below", fs::perms(0700));
     EXPECT_EQ(below("below/deep"), "below/deep");
-    EXPECT_TRUE(openFolderAs(login_, share_ / "below/deep"));
-    login_.uid = 54324;
-    EXPECT_FALSE(openFolderAs(login_, share_ / "below/deep"));
+    EXPECT_TRUE(openFolderAs(user_, share_ / "below/deep"));
+    user_.uid = 54324;
+    EXPECT_FALSE(openFolderAs(user_, share_ / "below/deep"));
     EXPECT_TRUE(openFolder(share_ / "below/deep")) << "root's rights are back";
     EXPECT_EQ(getgroups(0, nullptr), 0);
 }
 
 TEST_F(OpenFolder, exactlyFollowsNoLinks) {
     fs::create_directory_symlink("below", share_ / "alias");
-    const UniqueFd share = openFolder(share_);
-    EXPECT_TRUE(openFolderExactly(share, "below/deep"));
-    EXPECT_FALSE(openFolderExactly(share, "alias/deep"));
-    EXPECT_FALSE(openFolderExactly(share, ".."));
+    const auto share = openFolder(share_);
+    EXPECT_TRUE(openFolderExactly(*share, "below/deep"));
+    EXPECT_FALSE(openFolderExactly(*share, "alias/deep"));
+    EXPECT_FALSE(openFolderExactly(*share, ".."));
 }
 
 TEST_F(OpenFolder, theRemovedHasNoPlace) {
-    const UniqueFd folder = openFolder(share_ / "below/deep");
-    EXPECT_EQ(placeOf(folder), share_ / "below/deep");
+    const auto folder = openFolder(share_ / "below/deep");
+    EXPECT_EQ(placeOf(*folder), share_ / "below/deep");
     fs::remove(share_ / "below/deep");
-    EXPECT_EQ(placeOf(folder), "");
+    EXPECT_FALSE(placeOf(*folder));
     fs::create_directory(share_ / "below/deep (deleted)");
-    EXPECT_EQ(placeOf(folder), "") << "another folder of that name";
+    EXPECT_FALSE(placeOf(*folder)) << "another folder of that name";
 }
 
 } // namespace

@@ -6,6 +6,7 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
@@ -14,6 +15,8 @@
 
 namespace velt {
 namespace {
+
+using test::messageOf;
 
 ShareEntry shareCalled(const std::string& name) {
     ShareEntry share;
@@ -34,14 +37,14 @@ protected:
 };
 
 TEST_F(ShareStoreTest, HasNoSharesBeforeTheFirstStore) {
-    const auto shares = allShares();
+    const auto shares = loadShares();
     ASSERT_TRUE(shares);
     EXPECT_TRUE(shares->empty());
 }
 
 TEST_F(ShareStoreTest, GivesBackWhatWasStoredInItsOrder) {
-    ASSERT_EQ(saveShares({shareCalled("zebra"), shareCalled("alpha")}), 0) << lastErrorSentence();
-    const auto shares = allShares();
+    ASSERT_EQ(messageOf(storeShares({shareCalled("zebra"), shareCalled("alpha")})), "");
+    const auto shares = loadShares();
     ASSERT_TRUE(shares);
     ASSERT_EQ(shares->size(), 2U);
     EXPECT_EQ((*shares)[0].name, "zebra");
@@ -51,46 +54,50 @@ TEST_F(ShareStoreTest, GivesBackWhatWasStoredInItsOrder) {
 TEST_F(ShareStoreTest, SeesEachStoreAtOnce) {
     for (int round = 0; round < 30; ++round) {
         ShareEntry share = shareCalled("a");
-        share.users["ftp"] = round % 2 == 0 ? ShareGrant::none : ShareGrant::read;
-        ASSERT_EQ(saveShares({share}), 0);
-        ASSERT_EQ(allShares()->at(0).users.at("ftp"), share.users.at("ftp")) << round;
+        share.users["ftp"] = round % 2 == 0 ? Access::none : Access::read;
+        ASSERT_EQ(messageOf(storeShares({share})), "");
+        ASSERT_EQ(loadShares()->at(0).users.at("ftp"), share.users.at("ftp")) << round;
     }
 }
 
 TEST_F(ShareStoreTest, AFlawedShareIsNotStored) {
-    ASSERT_EQ(saveShares({shareCalled("good")}), 0);
+    ASSERT_EQ(messageOf(storeShares({shareCalled("good")})), "");
     const std::string before = folder_.read("/etc/velt/shares.json");
-    EXPECT_LT(saveShares({shareCalled("good"), shareCalled("a/b")}), 0);
-    EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::invalid));
-    EXPECT_NE(lastErrorSentence().find("share 2 (\"a/b\")"), std::string::npos) << lastErrorSentence();
-    EXPECT_LT(saveShares({shareCalled("twice"), shareCalled("twice")}), 0);
+    const auto refused = storeShares({shareCalled("good"), shareCalled("a/b")});
+    ASSERT_FALSE(refused);
+    EXPECT_EQ(refused.error().number, ErrorNumber::invalid);
+    EXPECT_NE(refused.error().message.find("share 2 (\"a/b\")"), std::string::npos) << messageOf(refused);
+    EXPECT_FALSE(storeShares({shareCalled("twice"), shareCalled("twice")}));
     EXPECT_EQ(folder_.read("/etc/velt/shares.json"), before);
 }
 
 TEST_F(ShareStoreTest, ADamagedFileIsAnErrorThatNamesIt) {
     folder_.write("/etc/velt/shares.json", R"({"version":1,"shares":[{"name":"a"}]})");
-    EXPECT_FALSE(allShares());
-    EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::damaged));
-    EXPECT_EQ(lastErrorSentence(), (folder_.path() / "etc/velt/shares.json").string() +
-                                       " is damaged: share 1 has no text \"path\".");
+    const auto shares = loadShares();
+    ASSERT_FALSE(shares);
+    EXPECT_EQ(shares.error().number, ErrorNumber::damaged);
+    EXPECT_EQ(shares.error().message, (folder_.path() / "etc/velt/shares.json").string() +
+                                          " is damaged: share 1 has no text \"path\".");
 }
 
 TEST_F(ShareStoreTest, AFileThatCannotBeReadIsAnError) {
     std::filesystem::create_directories(folder_.path() / "etc/velt/shares.json");
-    EXPECT_FALSE(allShares());
+    const auto shares = loadShares();
+    ASSERT_FALSE(shares);
+    fail(shares.error());
     EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::store));
 }
 
 TEST_F(ShareStoreTest, AStoreThatIsRefusedLeavesTheFile) {
-    ASSERT_EQ(saveShares({shareCalled("old")}), 0);
+    ASSERT_EQ(messageOf(storeShares({shareCalled("old")})), "");
     std::string seen;
     setEffectHook([&seen](Effect effect, std::string_view subject) {
         seen = std::string(effectName(effect)) + " " + std::string(subject);
         return EffectDecision{false, -1};
     });
-    EXPECT_LT(saveShares({shareCalled("new")}), 0);
+    EXPECT_FALSE(storeShares({shareCalled("new")}));
     EXPECT_EQ(seen, "store shares");
-    EXPECT_EQ(allShares()->at(0).name, "old");
+    EXPECT_EQ(loadShares()->at(0).name, "old");
 }
 
 TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
@@ -98,12 +105,12 @@ TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
     const auto addAll = [](const std::string& prefix) {
         for (int i = 0; i < each; ++i) {
             const StateLock lock;
-            std::optional<std::vector<ShareEntry>> shares = allShares();
+            auto shares = loadShares();
             if (!lock || !shares) {
                 return 1;
             }
             shares->push_back(shareCalled(prefix + std::to_string(i)));
-            if (saveShares(*shares) < 0) {
+            if (!storeShares(*shares)) {
                 return 2;
             }
         }
@@ -118,7 +125,7 @@ TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
     int status = -1;
     ASSERT_EQ(waitpid(child, &status, 0), child);
     EXPECT_EQ(status, 0);
-    EXPECT_EQ(allShares()->size(), 2U * each);
+    EXPECT_EQ(loadShares()->size(), 2U * each);
 }
 
 } // namespace

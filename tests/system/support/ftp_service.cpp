@@ -2,6 +2,7 @@
 
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "tests/support/result.h"
 
 #include <sys/stat.h>
 
@@ -35,18 +36,16 @@ void FtpService::letAnonymousIn(const std::string& share) {
     std::snprintf(record.anonymous_chroot_share, sizeof record.anonymous_chroot_share, "%s", share.c_str());
 }
 
-fs::path FtpService::addShare(const std::string& name, const std::string& folder, ShareGrant anonymous,
+fs::path FtpService::addShare(const std::string& name, const std::string& folder, Access anonymous,
                               bool offered) {
     const fs::path path = fs::path("/mnt/srv") / folder;
     fs::create_directories(path);
     EXPECT_EQ(chmod(path.c_str(), 0777), 0);
     ShareEntry share{name, "", path, offered, {}, {}};
-    share.users = {{"ftp", anonymous},
-                   {"alice", ShareGrant::write},
-                   {"bob", ShareGrant::write},
-                   {"carol", ShareGrant::write}};
+    share.users = {
+        {"ftp", anonymous}, {"alice", Access::write}, {"bob", Access::write}, {"carol", Access::write}};
     shares_.push_back(share);
-    EXPECT_EQ(velt::saveShares(shares_), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(velt::storeShares(shares_)), "");
     return path;
 }
 
@@ -58,7 +57,7 @@ void FtpService::start() {
     ASSERT_TRUE(daemon_.start(*plan));
 }
 
-void FtpService::saveRules(const std::vector<std::string>& rules) {
+void FtpService::storeRules(const std::vector<std::string>& rules) {
     VLIBCSzList* list = VLIBCSzListAlloc(16);
     for (const auto& rule : rules) {
         ASSERT_EQ(VLIBCSzListPush(&list, rule.c_str()), 0);

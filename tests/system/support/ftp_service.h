@@ -34,7 +34,7 @@ protected:
 
     /// A folder below /mnt/srv, owned by root with mode 0777, and a share for it, in which alice, bob and
     /// carol may write.
-    std::filesystem::path addShare(const std::string& name, const std::string& folder, ShareGrant anonymous,
+    std::filesystem::path addShare(const std::string& name, const std::string& folder, Access anonymous,
                                    bool offered = true);
 
     /// Stores the record and starts the daemon from its plan, in place of the one that runs.
@@ -42,7 +42,7 @@ protected:
     void stop() { daemon_.stop(); }
 
     /// Replaces all rules; each one is "u:1001:/path" or "g:2001:/path".
-    static void saveRules(const std::vector<std::string>& rules);
+    static void storeRules(const std::vector<std::string>& rules);
 
     static ProcessResult curl(std::vector<std::string> arguments);
 

@@ -5,6 +5,7 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/core/last_error.h"
+#include "tests/support/result.h"
 
 #include <sys/stat.h>
 
@@ -16,7 +17,7 @@
 
 namespace velt::test {
 
-using Grants = std::map<std::string, ShareGrant>;
+using Grants = std::map<std::string, Access>;
 
 /// A fixture with no shares at first. The Unix modes of the shares' folders allow everybody everything.
 class SharedFolders : public FtpService {
@@ -42,7 +43,7 @@ protected:
     ShareEntry& entry(const std::string& name) {
         return *std::ranges::find(shares_, name, &ShareEntry::name);
     }
-    void store() { EXPECT_EQ(velt::saveShares(shares_), 0) << lastErrorSentence(); }
+    void store() { EXPECT_EQ(messageOf(velt::storeShares(shares_)), ""); }
 
     /// The names that a session of the user's sees in the folder, sorted; "530" when the login is refused.
     static std::string seenBy(const std::string& user, const std::string& folder = "/") {

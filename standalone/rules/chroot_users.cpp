@@ -1,0 +1,169 @@
+#include "standalone/rules/chroot_users.h"
+
+#include "standalone/core/error_number.h"
+#include "standalone/core/state_lock.h"
+#include "standalone/rules/rule_store.h"
+
+#include <algorithm>
+#include <string_view>
+#include <unordered_map>
+#include <unordered_set>
+
+namespace velt {
+namespace {
+
+using Ids = std::unordered_set<uid_t>;
+using Rules = std::vector<ChrootRule>;
+
+bool confinesToHome(const ChrootRule& rule) {
+    return rule.isUser && rule.path == homePath;
+}
+
+Result<Ids> chrootUserIds() {
+    const auto rules = loadRules();
+    if (!rules) {
+        return rules.error();
+    }
+    Ids ids;
+    Ids seen;
+    for (const ChrootRule& rule : *rules) {
+        // A second rule of a user has no effect.
+        if (rule.isUser && seen.insert(rule.id).second && confinesToHome(rule)) {
+            ids.insert(rule.id);
+        }
+    }
+    return ids;
+}
+
+/// The names of the listed users whose number is one of these or, with `among` false, is none of them.
+std::vector<std::string> listedNames(const std::vector<UserEntry>& listed, const UserFilter& filter,
+                                     const Ids& ids, bool among) {
+    std::vector<std::string> names;
+    for (const UserEntry& user : listed) {
+        if (ids.contains(user.uid) == among && matches(user, filter)) {
+            names.push_back(user.name);
+        }
+    }
+    return names;
+}
+
+/// The names of those that no source lists: system accounts, and users of a domain that lists nobody.
+std::vector<std::string> unlistedNames(Ids ids, const std::vector<UserEntry>& listed,
+                                       const UserFilter& filter) {
+    for (const UserEntry& user : listed) {
+        ids.erase(user.uid);
+    }
+    std::vector<std::string> names;
+    for (const uid_t uid : ids) {
+        const auto user = userById(uid);
+        if (user && matches(*user, filter)) {
+            names.push_back(user->name);
+        }
+    }
+    std::ranges::sort(names);
+    return names;
+}
+
+/// The numbers of the users, without repetition, in their order.
+Result<std::vector<uid_t>> idsOf(const std::vector<std::string>& names) {
+    const auto users = allUsers();
+    std::unordered_map<std::string_view, uid_t> byName;
+    // Of two users with one name the first is the one who logs in.
+    for (const UserEntry& user : *users) {
+        byName.try_emplace(user.name, user.uid);
+    }
+    std::vector<uid_t> ids;
+    Ids seen;
+    for (const std::string& name : names) {
+        auto found = byName.find(name);
+        if (found == byName.end()) {
+            const auto user = userByName(name);
+            if (!user) {
+                return Error(ErrorNumber::notFound, "There is no user \"" + name + "\".");
+            }
+            found = byName.emplace(name, user->uid).first;
+        }
+        if (seen.insert(found->second).second) {
+            ids.push_back(found->second);
+        }
+    }
+    return ids;
+}
+
+// A user has one rule: it takes the place of one that confined the user to a share.
+void addRules(Rules& rules, const std::vector<uid_t>& ids) {
+    const Ids wanted(ids.begin(), ids.end());
+    Ids done;
+    Rules changed;
+    for (ChrootRule& rule : rules) {
+        const bool ofWanted = rule.isUser && wanted.contains(rule.id);
+        if (ofWanted && !done.insert(rule.id).second) {
+            continue;
+        }
+        if (ofWanted) {
+            rule.path = homePath;
+        }
+        changed.push_back(std::move(rule));
+    }
+    for (const uid_t uid : ids) {
+        if (!done.contains(uid)) {
+            changed.push_back({true, uid, std::string(homePath)});
+        }
+    }
+    rules = std::move(changed);
+}
+
+void deleteRules(Rules& rules, const std::vector<uid_t>& ids) {
+    const Ids wanted(ids.begin(), ids.end());
+    std::erase_if(rules,
+                  [&](const ChrootRule& rule) { return confinesToHome(rule) && wanted.contains(rule.id); });
+}
+
+Result<> change(const std::vector<std::string>& names, void (*apply)(Rules&, const std::vector<uid_t>&)) {
+    const auto ids = idsOf(names);
+    if (!ids) {
+        return ids.error();
+    }
+    const auto lock = StateLock::take();
+    if (!lock) {
+        return lock.error();
+    }
+    auto rules = loadRules();
+    if (!rules) {
+        return rules.error();
+    }
+    const Rules before = *rules;
+    apply(*rules, *ids);
+    return *rules == before ? Result<>() : storeRules(*rules);
+}
+
+} // namespace
+
+Result<std::vector<std::string>> chrootUsers(const UserFilter& filter) {
+    const auto ids = chrootUserIds();
+    if (!ids) {
+        return ids.error();
+    }
+    const auto users = allUsers();
+    auto names = listedNames(*users, filter, *ids, true);
+    std::ranges::move(unlistedNames(*ids, *users, filter), std::back_inserter(names));
+    return names;
+}
+
+Result<std::vector<std::string>> otherUsers(const UserFilter& filter) {
+    const auto ids = chrootUserIds();
+    if (!ids) {
+        return ids.error();
+    }
+    return listedNames(*allUsers(), filter, *ids, false);
+}
+
+Result<> addChrootUsers(const std::vector<std::string>& names) {
+    return change(names, addRules);
+}
+
+Result<> deleteChrootUsers(const std::vector<std::string>& names) {
+    return change(names, deleteRules);
+}
+
+} // namespace velt

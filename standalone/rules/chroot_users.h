@@ -1,0 +1,31 @@
+// The chroot users: those whose rule confines them to their own home.
+//
+// All of it works on the stored rules and may be called from any thread.
+#ifndef VELT_STANDALONE_RULES_CHROOT_USERS_H
+#define VELT_STANDALONE_RULES_CHROOT_USERS_H
+
+#include "base/result.h"
+#include "standalone/accounts/user_directory.h"
+
+#include <string>
+#include <vector>
+
+namespace velt {
+
+/// The names of the chroot users: first those whom the sources list, in their order, then the others (system
+/// accounts, users of a domain that lists nobody) by name.
+Result<std::vector<std::string>> chrootUsers(const UserFilter& filter);
+
+/// The names of the listed users who are not chroot users.
+Result<std::vector<std::string>> otherUsers(const UserFilter& filter);
+
+/// Gives each of these users a rule for the own home, in place of any other rule of that user. A name may
+/// come twice. Nothing is changed when one of them is nobody's.
+Result<> addChrootUsers(const std::vector<std::string>& names);
+
+/// Takes the rule for the own home from each of these users; other rules of theirs stay. As above otherwise.
+Result<> deleteChrootUsers(const std::vector<std::string>& names);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,65 @@
+#include "standalone/shares/share_access.h"
+
+#include "standalone/accounts/user_directory.h"
+#include "standalone/shares/folder_access.h"
+
+#include <algorithm>
+
+namespace velt {
+
+namespace {
+
+// The kernel's own number for somebody who owns nothing.
+constexpr uid_t stranger = 65534;
+
+std::optional<Access> grantToGroups(const ShareEntry& share, const std::vector<gid_t>& gids) {
+    std::optional<Access> best;
+    for (const auto& [name, grant] : share.groups) {
+        const std::optional<GroupEntry> group = groupByName(name);
+        if (!group || std::find(gids.begin(), gids.end(), group->gid) == gids.end()) {
+            continue;
+        }
+        if (grant == Access::none) {
+            return grant;
+        }
+        best = std::max(best, std::optional(grant));
+    }
+    return best;
+}
+
+std::optional<Access> grantToUser(const ShareEntry& share, const Identity& user) {
+    const auto entry = share.users.find(user.name);
+    return entry != share.users.end() ? entry->second : grantToGroups(share, user.gids);
+}
+
+/// What remains of the grant where the file system allows this account less.
+Result<std::optional<Access>> limited(std::optional<Access> grant, const ShareEntry& share,
+                                      const Identity& who) {
+    if (!grant || *grant == Access::none) {
+        return grant;
+    }
+    const Result<Access> allowed = folderAccess(share.path, who);
+    if (!allowed) {
+        return allowed.error();
+    }
+    return std::optional(std::min(*grant, *allowed));
+}
+
+} // namespace
+
+Result<std::optional<Access>> accessOf(const Identity& user, const ShareEntry& share) {
+    return limited(grantToUser(share, user), share, user);
+}
+
+Result<std::optional<Access>> accessOf(const std::string& account, const ShareEntry& share) {
+    if (const std::optional<UserEntry> user = userByName(account)) {
+        return accessOf(Identity{account, user->uid, groupsOf(*user)}, share);
+    }
+    if (const std::optional<GroupEntry> group = groupByName(account)) {
+        const Identity member{"", stranger, {group->gid}};
+        return limited(grantToGroups(share, member.gids), share, member);
+    }
+    return std::optional<Access>();
+}
+
+} // namespace velt

@@ -1,0 +1,86 @@
+#include "standalone/login/grants.h"
+
+#include "tests/standalone/support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class GrantsTest : public testing::Test {
+protected:
+    void SetUp() override {
+        if (geteuid() != 0) {
+            GTEST_SKIP() << "only root can take another account's identity";
+        }
+        chmod(root_.path().c_str(), 0755);
+        for (const char* folder : {"outer/inner", "outer/closed"}) {
+            fs::create_directories(top_ / folder);
+        }
+        for (const char* folder : {"outer", "outer/inner", "outer/closed"}) {
+            fs::permissions(top_ / folder, fs::perms::all);
+        }
+    }
+    void share(const std::string& path, Access access) {
+        shares_.push_back(
+            {"s" + std::to_string(shares_.size()), "", top_ / path, true, {{"ann", access}}, {}});
+    }
+    /// "inner read, closed none": what restricts a login that may write in the folder.
+    std::string restrictionsBelow(const std::string& path) {
+        const Grants grants(user_, shares_);
+        std::string text;
+        for (const Restriction& one : grants.restrictionsBelow(top_ / path, Access::write)) {
+            text += (text.empty() ? "" : ", ") + one.place.string();
+            text += one.access == Access::none ? " none" : one.access == Access::read ? " read" : " write";
+        }
+        return text;
+    }
+
+    TemporaryFolder root_;
+    const fs::path top_ = fs::canonical(root_.path());
+    Identity user_{"ann", 54321, {54322}};
+    std::vector<ShareEntry> shares_;
+};
+
+TEST_F(GrantsTest, ofAnInnerShareTakeFromThoseOfTheOuter) {
+    share("outer/inner", Access::read);
+    share("outer", Access::write);
+    share("outer/closed", Access::none);
+    EXPECT_EQ(restrictionsBelow("outer"), "inner read, closed none");
+    EXPECT_EQ(restrictionsBelow("outer/inner"), "");
+}
+
+TEST_F(GrantsTest, ofAnInnerShareAddNothing) {
+    share("outer", Access::read);
+    share("outer/inner", Access::write);
+    const Grants grants(user_, shares_);
+    EXPECT_EQ(grants.on(shares_[1]), Access::write);
+    EXPECT_EQ(grants.leastAt(top_ / "outer/inner", top_ / "outer", Access::read), Access::read);
+    EXPECT_EQ(grants.leastAt(top_ / "outer/inner", top_ / "outer", Access::write), Access::write);
+}
+
+TEST_F(GrantsTest, holdWhereALinkLeadsToTheShare) {
+    fs::create_directory_symlink("outer", top_ / "alias");
+    share("alias/inner", Access::none);
+    EXPECT_EQ(restrictionsBelow("outer"), "inner none");
+    const Grants grants(user_, shares_);
+    EXPECT_EQ(grants.leastAt(top_ / "outer/inner", top_ / "outer", Access::write), Access::none);
+}
+
+TEST_F(GrantsTest, areNoneWhereNothingIsToldOrCanBeAsked) {
+    share("outer", Access::write);
+    EXPECT_EQ(Grants(user_, shares_).on(shares_[0]), Access::write);
+    const Identity withoutGroup{"ann", 54321, {}};
+    EXPECT_EQ(Grants(withoutGroup, shares_).on(shares_[0]), Access::none);
+    shares_[0].users.clear();
+    EXPECT_EQ(Grants(user_, shares_).on(shares_[0]), Access::none);
+    share("absent", Access::write);
+    EXPECT_EQ(Grants(user_, shares_).on(shares_[1]), Access::none);
+}
+
+} // namespace
+} // namespace velt::test

@@ -1,0 +1,118 @@
+// Real mounts, in a mount namespace of the test's own.
+#include "standalone/login/view_mounts.h"
+
+#include "standalone/login/open_folder.h"
+#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
+
+#include <gtest/gtest.h>
+
+#include <fcntl.h>
+#include <sched.h>
+#include <sys/mount.h>
+
+#include <cerrno>
+#include <cstring>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class ViewMounts : public testing::Test {
+protected:
+    void SetUp() override {
+        if (unshare(CLONE_NEWNS) != 0) {
+            GTEST_SKIP() << "no mount namespace: " << std::strerror(errno);
+        }
+        ASSERT_EQ(messageOf(isolateMounts()), "");
+        fs::create_directories(view_);
+        fs::create_directories(root_.path() / "server");
+        mountDisk(root_.path() / "server");
+        fs::create_directories(share_ / "inner/deep");
+        fs::create_directories(share_ / "disk");
+        mountDisk(share_ / "disk");
+        root_.write("server/share/inner/file", "x");
+    }
+    void TearDown() override {
+        umount2(view_.c_str(), MNT_DETACH);
+        umount2((root_.path() / "server").c_str(), MNT_DETACH);
+    }
+
+    static void mountDisk(const fs::path& place) {
+        ASSERT_EQ(mount("disk", place.c_str(), "tmpfs", 0, nullptr), 0) << std::strerror(errno);
+    }
+    VisibleFolder share(Access access, std::vector<Restriction> restrictions = {}) const {
+        auto folder = openFolder(share_);
+        EXPECT_EQ(messageOf(folder), "");
+        return {std::move(*folder), access, std::move(restrictions)};
+    }
+    /// Why no file can be made in the folder; "" when one can.
+    static std::string whyNotWritable(const fs::path& folder) {
+        const UniqueFd file(open((folder / "new").c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600));
+        return file ? "" : std::strerror(errno);
+    }
+
+    TemporaryFolder root_;
+    const fs::path share_ = root_.path() / "server/share";
+    const fs::path view_ = root_.path() / "view";
+    const std::string readOnly_ = std::strerror(EROFS);
+};
+
+TEST_F(ViewMounts, forReadingAreReadOnlyWithAllThatIsMountedBelow) {
+    ASSERT_EQ(messageOf(showFolder(view_, share(Access::read))), "");
+    EXPECT_TRUE(fs::exists(view_ / "inner/file"));
+    EXPECT_EQ(whyNotWritable(view_), readOnly_);
+    EXPECT_EQ(whyNotWritable(view_ / "disk"), readOnly_);
+    EXPECT_EQ(whyNotWritable(share_ / "disk"), "") << "the server's own mount does not change";
+}
+
+TEST_F(ViewMounts, forWritingAreWritable) {
+    ASSERT_EQ(messageOf(showFolder(view_, share(Access::write))), "");
+    EXPECT_EQ(whyNotWritable(view_), "");
+    EXPECT_EQ(whyNotWritable(view_ / "disk"), "");
+    EXPECT_TRUE(fs::exists(share_ / "new"));
+}
+
+TEST_F(ViewMounts, doNotFollowWhatIsMountedLater) {
+    ASSERT_EQ(mount(nullptr, (root_.path() / "server").c_str(), nullptr, MS_REC | MS_SHARED, nullptr), 0);
+    ASSERT_EQ(messageOf(showFolder(view_, share(Access::write))), "");
+    mountDisk(share_ / "inner");
+    root_.write("server/share/inner/later", "x");
+    EXPECT_FALSE(fs::exists(view_ / "inner/later"));
+    EXPECT_TRUE(fs::exists(view_ / "inner/file"));
+}
+
+TEST_F(ViewMounts, restrictFoldersWithin) {
+    ASSERT_EQ(messageOf(showFolder(view_, share(Access::write, {{"inner/deep", Access::read}}))), "");
+    EXPECT_EQ(whyNotWritable(view_ / "inner"), "");
+    EXPECT_EQ(whyNotWritable(view_ / "inner/deep"), readOnly_);
+}
+
+TEST_F(ViewMounts, hideFoldersWithAllThatIsInThem) {
+    const std::vector<Restriction> both = {{"inner", Access::none}, {"inner/deep", Access::read}};
+    ASSERT_EQ(messageOf(showFolder(view_, share(Access::write, both))), "");
+    EXPECT_TRUE(fs::is_empty(view_ / "inner"));
+    EXPECT_EQ(whyNotWritable(view_ / "inner"), readOnly_);
+    EXPECT_TRUE(fs::exists(share_ / "inner/file"));
+}
+
+TEST_F(ViewMounts, areRefusedWhereARestrictionCannotBeMade) {
+    EXPECT_FALSE(showFolder(view_, share(Access::write, {{"absent", Access::read}})));
+    fs::create_directory_symlink("inner", share_ / "link");
+    EXPECT_FALSE(showFolder(view_, share(Access::write, {{"link", Access::none}})));
+}
+
+TEST_F(ViewMounts, sideBySideLeaveOutWhatCannotBeRestricted) {
+    SideBySide view(view_);
+    ASSERT_EQ(messageOf(view.begin()), "");
+    EXPECT_EQ(messageOf(view.add("good", share(Access::write))), "");
+    EXPECT_FALSE(view.add("bad", share(Access::write, {{"absent", Access::read}})));
+    ASSERT_EQ(messageOf(view.finish()), "");
+    EXPECT_TRUE(fs::exists(view_ / "good/inner/file"));
+    EXPECT_EQ(whyNotWritable(view_ / "good"), "");
+    EXPECT_FALSE(fs::exists(view_ / "bad"));
+    EXPECT_EQ(whyNotWritable(view_), readOnly_);
+}
+
+} // namespace
+} // namespace velt::test
