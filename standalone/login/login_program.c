@@ -11,11 +11,34 @@
 #include <time.h>
 #include <unistd.h>
 
+/* Only the error output leads back; the client's connection and the server's keys are not the program's. */
+static int describe_files(posix_spawn_file_actions_t* files, int errors) {
+    int failure = posix_spawn_file_actions_adddup2(files, errors, STDERR_FILENO);
+
+    if (failure == 0) {
+        failure = posix_spawn_file_actions_addopen(files, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    }
+    if (failure == 0) {
+        failure = posix_spawn_file_actions_addopen(files, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+    }
+    return failure != 0 ? failure : posix_spawn_file_actions_addclosefrom_np(files, STDERR_FILENO + 1);
+}
+
+/* No signal blocked or ignored, whatever the daemon does with its own. */
+static int describe_signals(posix_spawnattr_t* attributes) {
+    sigset_t signals;
+
+    (void)sigfillset(&signals);
+    (void)posix_spawnattr_setsigdefault(attributes, &signals);
+    (void)sigemptyset(&signals);
+    (void)posix_spawnattr_setsigmask(attributes, &signals);
+    return posix_spawnattr_setflags(attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+}
+
 static int spawn(char* const arguments[], int errors, pid_t* child) {
     static char* const no_environment[] = {NULL};
     posix_spawn_file_actions_t files;
     posix_spawnattr_t attributes;
-    sigset_t signals;
 
     int failure = posix_spawn_file_actions_init(&files);
     if (failure != 0) {
@@ -26,23 +49,9 @@ static int spawn(char* const arguments[], int errors, pid_t* child) {
         (void)posix_spawn_file_actions_destroy(&files);
         return failure;
     }
-    (void)sigfillset(&signals);
-    (void)posix_spawnattr_setsigdefault(&attributes, &signals);
-    (void)sigemptyset(&signals);
-    (void)posix_spawnattr_setsigmask(&attributes, &signals);
-    failure = posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
+    failure = describe_files(&files, errors);
     if (failure == 0) {
-        failure = posix_spawn_file_actions_adddup2(&files, errors, STDERR_FILENO);
-    }
-    if (failure == 0) {
-        failure = posix_spawn_file_actions_addopen(&files, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    }
-    if (failure == 0) {
-        failure = posix_spawn_file_actions_addopen(&files, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
-    }
-    /* The client's connection and the server's keys are not the program's. */
-    if (failure == 0) {
-        failure = posix_spawn_file_actions_addclosefrom_np(&files, STDERR_FILENO + 1);
+        failure = describe_signals(&attributes);
     }
     if (failure == 0) {
         failure = posix_spawn(child, arguments[0], &files, &attributes, arguments, no_environment);

@@ -4,7 +4,10 @@
 
 #include <gtest/gtest.h>
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 extern "C" {
 #include "standalone/login/login_program.h"
@@ -82,6 +85,22 @@ TEST_F(LoginModule, waitsForAProgramNoLongerThanItSays) {
     EXPECT_EQ(velt_run_login_program(arguments.data(), 1, words.data(), words.size()), 0);
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
     EXPECT_STREQ(words.data(), "it takes too long");
+    EXPECT_EQ(waitpid(-1, nullptr, WNOHANG), -1) << "the program has been ended";
+}
+
+TEST_F(LoginModule, givesNoFileOfTheDaemonToTheProgram) {
+    const int keys = fcntl(STDIN_FILENO, F_DUPFD, 100);
+    ASSERT_GE(keys, 100);
+    EXPECT_EQ(logIn(script("test ! -e /proc/self/fd/" + std::to_string(keys) + "\n")), login_granted)
+        << logged();
+    close(keys);
+}
+
+TEST_F(LoginModule, givesBackTheRightsThatItTakes) {
+    logIn(script("exit 0\n"));
+    EXPECT_EQ(rights_taken(), 0);
+    logIn(script("exit 1\n"));
+    EXPECT_EQ(rights_taken(), 0);
 }
 
 TEST_F(LoginModule, cutsLongWords) {

@@ -14,6 +14,7 @@ static const struct login_world* world;
 static listener on_code;
 static listener on_root;
 static int ended;
+static int rights;
 static char log_text[2048];
 static char memory[65536];
 static size_t used;
@@ -141,12 +142,14 @@ void pr_log_pri(int priority, const char* format, ...) {
 int pr_privs_root(const char* file, int line) {
     (void)file;
     (void)line;
+    rights++;
     return 0;
 }
 
 int pr_privs_relinquish(const char* file, int line) {
     (void)file;
     (void)line;
+    rights--;
     return 0;
 }
 
@@ -177,6 +180,7 @@ static void begin(const struct login_world* login) {
     world = login;
     used = 0;
     ended = FALSE;
+    rights = 0;
     log_text[0] = '\0';
     session.user = "alice";
     (void)velt_login_module.sess_init();
@@ -206,4 +210,8 @@ enum login_end change_root_unasked(const struct login_world* login) {
 
 const char* logged(void) {
     return log_text;
+}
+
+int rights_taken(void) {
+    return rights;
 }

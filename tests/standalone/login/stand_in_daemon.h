@@ -25,4 +25,7 @@ enum login_end change_root_unasked(const struct login_world* world);
 /* What the module wrote to the log in the last call; "" when nothing. */
 const char* logged(void);
 
+/* How often root's rights were taken in the last call and not given back. */
+int rights_taken(void);
+
 #endif
