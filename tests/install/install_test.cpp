@@ -79,6 +79,30 @@ TEST_F(Installation, holdsTheseFilesAndNoOthers) {
     EXPECT_EQ(filesBelow(prefix()), expected);
 }
 
+// What is shown there is what is tested here, and what scripts/start does.
+TEST(InstallationPage, showsHowToInstall) {
+    const std::string page = runProcess({"cat", VELT_SOURCE_FOLDER "/README.md"}).output;
+    const std::string shown = page.substr(page.find("\n## On a server\n"));
+    for (const char* command : {"\n    scripts/install-packages ",
+                                "\n    cmake --preset release && cmake --build --preset release\n",
+                                "\n    cmake --install build/release --prefix /usr/local\n"}) {
+        EXPECT_NE(shown.find(command), std::string::npos) << command;
+    }
+    const std::string start = runProcess({"cat", VELT_SOURCE_FOLDER "/scripts/start"}).output;
+    for (const char* command : {"\n    scripts/install-packages\n", "\n    cmake --preset release >"}) {
+        EXPECT_NE(start.find(command), std::string::npos) << command;
+    }
+}
+
+TEST(InstallationPage, aReleaseNeedsNoPackageOfTheTests) {
+    const TemporaryFolder folder;
+    const ProcessResult configured =
+        runProcess({VELT_CMAKE, "-S", VELT_SOURCE_FOLDER, "--preset", "release", "-B",
+                    (folder.path() / "build").string(), "-DCMAKE_DISABLE_FIND_PACKAGE_GTest=ON"},
+                   {}, std::chrono::seconds(100));
+    EXPECT_EQ(configured.exitCode, 0) << configured.errors;
+}
+
 TEST_F(Installation, itsProgramsStart) {
     const ProcessResult client = run("bin/veltctl", {"--version"});
     EXPECT_EQ(client.exitCode, 0) << client.errors;
