@@ -33,7 +33,7 @@ std::string withOutputs(const std::string& page, const std::vector<std::string>&
 }
 
 std::string masked(const std::string& text) {
-    static const std::array<std::pair<std::regex, const char*>, 7> masks{{
+    static const std::array<std::pair<std::regex, const char*>, 8> masks{{
         {std::regex(R"(\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d\.\d{3}Z)"), "TIME"},
         {std::regex(R"(\d+ [A-Z][a-z]{2} [ \d]\d \d\d:\d\d)"), "SIZE TIME"},
         {std::regex(R"(\bprocess \d+)"), "process ID"},
@@ -41,6 +41,7 @@ std::string masked(const std::string& text) {
         {std::regex(R"(\b[0-9a-f]{8}-[0-9a-f]{6}\b)"), "REQUEST"},
         {std::regex(R"(after \d+ ms)"), "after TIME"},
         {std::regex(R"(up for \d+ s)"), "up for TIME"},
+        {std::regex("Could(n't| not) connect"), "Could not connect"}, // by the version of curl
     }};
     std::string result = text;
     for (const auto& [pattern, name] : masks) {
