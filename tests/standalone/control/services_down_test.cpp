@@ -83,17 +83,17 @@ TEST_F(ServicesDownTest, ARefusedRestartLeavesFormerSettingsInForce) {
 }
 
 TEST_F(ServicesDownTest, ADaemonThatKeepsCrashingTellsItsLastEnd) {
-    planDouble().ftpOptions = {"--live", "100"};
+    planDouble().ftpOptions = {"--live", "500"};
     ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     const Down expected{{"ftp", "The FTP daemon does not run: velt-test-daemon: lived long enough.", false}};
-    EXPECT_TRUE(waitUntil([&expected] { return servicesDown() == expected; }, seconds(5)))
+    EXPECT_TRUE(waitUntil([&expected] { return servicesDown() == expected; }, seconds(20)))
         << testing::PrintToString(servicesDown());
 }
 
 TEST_F(ServicesDownTest, RestartsAreCountedByDaemon) {
-    planDouble().ftpOptions = {"--live", "100"};
+    planDouble().ftpOptions = {"--live", "500"};
     ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
-    EXPECT_TRUE(waitUntil([] { return daemonRestarts("ftpd") >= 2; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([] { return daemonRestarts("ftpd") >= 2; }, seconds(20)));
     EXPECT_EQ(daemonRestarts("sftp"), 0U);
     EXPECT_EQ(daemonRestarts("nonsense"), 0U);
 }
