@@ -113,7 +113,7 @@ LogFilter parseQuery(const std::string& query) {
 }
 
 /// The id to ask on from after this page; null when no entry comes after it.
-std::optional<Json::Value> nextAfter(const std::vector<LogEntry>& page, LogFilter filter) {
+Result<Json::Value> nextAfter(const std::vector<LogEntry>& page, LogFilter filter) {
     if (page.size() < static_cast<std::size_t>(filter.limit)) {
         return Json::Value();
     }
@@ -121,16 +121,16 @@ std::optional<Json::Value> nextAfter(const std::vector<LogEntry>& page, LogFilte
     filter.limit = 1;
     const auto rest = queryLog(filter);
     if (!rest) {
-        return std::nullopt;
+        return rest.error();
     }
     return rest->empty() ? Json::Value() : Json::Value(Json::Int64{page.back().id});
 }
 
 HttpResponse answerPage(const LogFilter& filter, const Call& call) {
     const auto page = queryLog(filter);
-    const auto next = page ? nextAfter(*page, filter) : std::nullopt;
+    const auto next = page ? nextAfter(*page, filter) : page.error();
     if (!next) {
-        return problem(500, lastErrorSentence(), call.id);
+        return problem(500, next.error().message, call.id);
     }
     Json::Value value(Json::objectValue);
     value["next"] = *next;

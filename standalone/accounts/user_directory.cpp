@@ -2,9 +2,11 @@
 
 #include "base/file.h"
 #include "base/file_stamp.h"
+#include "base/plain_text.h"
 #include "standalone/accounts/account_snapshot.h"
 #include "standalone/accounts/account_sources.h"
 #include "standalone/accounts/name_service.h"
+#include "standalone/core/error_number.h"
 
 #include <algorithm>
 #include <array>
@@ -16,6 +18,8 @@ namespace velt {
 namespace {
 
 using Clock = std::chrono::steady_clock;
+
+constexpr std::size_t longestNameShown = 120;
 
 struct ModuleName {
     std::string_view name;
@@ -251,6 +255,20 @@ std::optional<GroupEntry> groupById(gid_t gid) {
         }
     }
     return std::nullopt;
+}
+
+Result<UserEntry> findUser(const std::string& name) {
+    if (auto user = userByName(name)) {
+        return std::move(*user);
+    }
+    return Error(ErrorNumber::notFound, "There is no user \"" + plainText(name, longestNameShown) + "\".");
+}
+
+Result<GroupEntry> findGroup(const std::string& name) {
+    if (auto group = groupByName(name)) {
+        return std::move(*group);
+    }
+    return Error(ErrorNumber::notFound, "There is no group \"" + plainText(name, longestNameShown) + "\".");
 }
 
 std::vector<gid_t> groupsOf(const UserEntry& user) {

@@ -5,6 +5,8 @@
 #ifndef VELT_STANDALONE_ACCOUNTS_USER_DIRECTORY_H
 #define VELT_STANDALONE_ACCOUNTS_USER_DIRECTORY_H
 
+#include "base/result.h"
+
 #include <sys/types.h>
 
 #include <memory>
@@ -46,6 +48,10 @@ std::optional<UserEntry> userByName(const std::string& name);
 std::optional<UserEntry> userById(uid_t uid);
 std::optional<GroupEntry> groupByName(const std::string& name);
 std::optional<GroupEntry> groupById(gid_t gid);
+
+/// As userByName and groupByName; that there is none is an error.
+Result<UserEntry> findUser(const std::string& name);
+Result<GroupEntry> findGroup(const std::string& name);
 
 /// The numbers of all groups that the user belongs to, the primary one first.
 std::vector<gid_t> groupsOf(const UserEntry& user);

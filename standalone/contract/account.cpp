@@ -1,9 +1,7 @@
 #include "platform/account.h"
 
-#include "base/plain_text.h"
 #include "standalone/accounts/user_directory.h"
 #include "standalone/core/boundary.h"
-#include "standalone/core/last_error.h"
 
 #include <limits>
 #include <map>
@@ -57,42 +55,50 @@ VELT_GROUP* internGroup(velt::GroupEntry group) {
 
 constexpr auto largestId = static_cast<unsigned>(std::numeric_limits<int>::max());
 
-} // namespace
+velt::Result<VELT_USER*> lookUpUser(const char* name) {
+    velt::Result<velt::UserEntry> user = velt::findUser(name);
+    if (!user) {
+        return user.error();
+    }
+    if (user->uid > largestId) {
+        return velt::Error(velt::ErrorNumber::invalid,
+                           "The number of user \"" + user->name + "\" is too large.");
+    }
+    return internUser(std::move(*user));
+}
 
-int VELTUserGet(const char* name, VELT_USER** out) {
-    return velt::atBoundary([&] {
+velt::Result<VELT_GROUP*> lookUpGroup(const char* name) {
+    velt::Result<velt::GroupEntry> group = velt::findGroup(name);
+    if (!group) {
+        return group.error();
+    }
+    if (group->gid > largestId) {
+        return velt::Error(velt::ErrorNumber::invalid,
+                           "The number of group \"" + group->name + "\" is too large.");
+    }
+    return internGroup(std::move(*group));
+}
+
+template<class Record> int get(velt::Result<Record*> (&lookUp)(const char*), const char* name, Record** out) {
+    return velt::atBoundary([&]() -> velt::Result<> {
         if (name == nullptr || out == nullptr) {
-            return velt::fail(velt::ErrorNumber::invalid, "A user look-up needs a name.");
+            return velt::Error(velt::ErrorNumber::invalid, "A look-up of an account needs a name.");
         }
-        std::optional<velt::UserEntry> user = velt::userByName(name);
-        if (!user) {
-            return velt::fail(velt::ErrorNumber::notFound,
-                              "There is no user \"" + velt::plainText(name, 120) + "\".");
+        const velt::Result<Record*> record = lookUp(name);
+        if (!record) {
+            return record.error();
         }
-        if (user->uid > largestId) {
-            return velt::fail(velt::ErrorNumber::invalid,
-                              "The number of user \"" + velt::plainText(name, 120) + "\" is too large.");
-        }
-        *out = internUser(std::move(*user));
-        return 0;
+        *out = *record;
+        return {};
     });
 }
 
+} // namespace
+
+int VELTUserGet(const char* name, VELT_USER** out) {
+    return get(lookUpUser, name, out);
+}
+
 int VELTGroupGet(const char* name, VELT_GROUP** out) {
-    return velt::atBoundary([&] {
-        if (name == nullptr || out == nullptr) {
-            return velt::fail(velt::ErrorNumber::invalid, "A group look-up needs a name.");
-        }
-        std::optional<velt::GroupEntry> group = velt::groupByName(name);
-        if (!group) {
-            return velt::fail(velt::ErrorNumber::notFound,
-                              "There is no group \"" + velt::plainText(name, 120) + "\".");
-        }
-        if (group->gid > largestId) {
-            return velt::fail(velt::ErrorNumber::invalid,
-                              "The number of group \"" + velt::plainText(name, 120) + "\" is too large.");
-        }
-        *out = internGroup(std::move(*group));
-        return 0;
-    });
+    return get(lookUpGroup, name, out);
 }

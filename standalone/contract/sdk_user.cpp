@@ -1,6 +1,5 @@
 #include "platform/sdk_user.h"
 
-#include "base/plain_text.h"
 #include "standalone/accounts/user_directory.h"
 #include "standalone/core/last_error.h"
 
@@ -20,9 +19,9 @@ struct LoadedUser : SDK::User {
 namespace SDK {
 
 User* User::LoadUser(const std::string& name) {
-    std::optional<velt::UserEntry> user = velt::userByName(name);
+    velt::Result<velt::UserEntry> user = velt::findUser(name);
     if (!user) {
-        velt::fail(velt::ErrorNumber::notFound, "There is no user \"" + velt::plainText(name, 120) + "\".");
+        velt::fail(user.error());
         return nullptr;
     }
     return std::make_unique<LoadedUser>(std::move(user->description)).release();

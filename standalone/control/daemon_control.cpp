@@ -67,7 +67,7 @@ struct NextStart {
 /// The configuration's test takes the daemon's time, so nothing is tested where nothing runs.
 NextStart nextStart(Daemon daemon, const ServiceState& now) {
     const bool serving = isServing(now);
-    const auto portIsFree = [&now](int port) { return probePorts({port}, now.daemon.pid) >= 0; };
+    const auto portIsFree = [&now](int port) { return toContract(probePorts({port}, now.daemon.pid)) >= 0; };
     if (daemon == Daemon::ftp) {
         const auto settings = orLastError(loadFtpSettings());
         if (!settings || !enablesFtp(settings->record)) {
@@ -125,7 +125,7 @@ int startPlanned(Daemon daemon) {
 
 void followWithFirewall() {
     const LastErrorKept kept;
-    if (perform(Effect::firewall, "firewall rules", loadFirewallRules) < 0) {
+    if (toContract(perform(Effect::firewall, "firewall rules", loadFirewallRules)) < 0) {
         ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
     }
 }

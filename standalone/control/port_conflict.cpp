@@ -176,7 +176,7 @@ int findConflict(const Question& question) {
         return report(*conflict);
     }
     const auto ports = loadConfiguredPorts();
-    const auto services = loadKnownServices();
+    const auto services = orLastError(loadKnownServices());
     if (!ports || !services) {
         return -1; // a question that cannot be answered is no permission to take the port
     }

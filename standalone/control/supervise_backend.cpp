@@ -1,6 +1,7 @@
 #include "standalone/control/supervise_backend.h"
 
 #include "standalone/control/child_launcher.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -60,7 +61,7 @@ int SuperviseBackend::start(const DaemonPlan& plan) {
     if (supervised && isServing(now) && now.configurationHash == plan.configurationHash) {
         return 0;
     }
-    if (probePorts(plan.listenPorts, isAlive(now.daemon) ? now.daemon.pid : 0) < 0) {
+    if (toContract(probePorts(plan.listenPorts, isAlive(now.daemon) ? now.daemon.pid : 0)) < 0) {
         return -1;
     }
     if (!supervised) {

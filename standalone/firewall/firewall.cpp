@@ -1,8 +1,7 @@
 #include "standalone/firewall/firewall.h"
 
 #include "base/file.h"
-#include "standalone/core/boundary.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -32,16 +31,15 @@ std::string firstLine(const std::string& text) {
     return text.substr(0, text.find('\n'));
 }
 
-int failToLoad(const ProcessResult& result) {
+Error cannotLoad(const ProcessResult& result) {
     std::string reason = firstLine(result.errors);
     while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
         reason.pop_back(); // it may be a sentence of its own
     }
     if (reason.find("Operation not permitted") != std::string::npos) {
-        return fail(ErrorNumber::firewall,
-                    "The firewall rules are not loaded: this process may not administer the network.");
+        reason = "this process may not administer the network";
     }
-    return fail(ErrorNumber::firewall, "The firewall rules are not loaded: " + reason + ".");
+    return {ErrorNumber::firewall, "The firewall rules are not loaded: " + reason + "."};
 }
 
 void warnOfForeignTables() {
@@ -72,57 +70,60 @@ bool mayTouchRules() {
     return statePath("/") == "/" || std::filesystem::exists(statePath(paths::firewallSettings), ignored);
 }
 
-int removeRules(const std::string& script) {
+Result<> removeRules(const std::string& script) {
     const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
     if (result.exitCode != 0) {
-        return failToLoad(result);
+        return cannotLoad(result);
     }
     noteRemoved();
     std::error_code ignored;
     std::filesystem::remove(warningFile(), ignored);
-    return 0;
+    return {};
 }
 
 // Each start of a service comes here, and most change no port.
-int replaceRules(const std::string& script) {
+Result<> replaceRules(const std::string& script) {
     if (rulesAreInForce(script)) {
-        return 0;
+        return {};
     }
     // Noted before it is done, since a note without rules does no harm.
-    if (toContract(noteLoading()) < 0) {
-        return -1;
+    if (Result<> noted = noteLoading(); !noted) {
+        return noted;
     }
     const auto before = rulesetGeneration();
     const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
     if (result.exitCode != 0) {
-        return failToLoad(result);
+        return cannotLoad(result);
     }
     noteLoaded(script, before);
     warnOfForeignTables();
-    return 0;
+    return {};
 }
 
 } // namespace
 
-int loadFirewallRules() {
+Result<> loadFirewallRules() {
     if (!mayTouchRules()) {
-        return 0;
+        return {};
     }
     // Held until the rules are loaded: of two processes the one with the older settings must not load its
     // rules last.
-    const StateLock lock;
-    const auto firewall = lock ? loadFirewallSettings() : std::nullopt;
+    const auto lock = StateLock::take();
+    if (!lock) {
+        return lock.error();
+    }
+    const auto firewall = loadFirewallSettings();
     if (!firewall) {
-        return -1;
+        return firewall.error();
     }
     const bool off = firewall->mode == FirewallMode::off;
     if (off && !rulesWereLoaded()) {
-        return 0; // nothing to take away, and perhaps no right to do it
+        return {}; // nothing to take away, and perhaps no right to do it
     }
-    const auto ftp = orLastError(loadFtpSettings());
-    const auto sftp = orLastError(loadSftpSettings());
+    const auto ftp = loadFtpSettings();
+    const auto sftp = loadSftpSettings();
     if (!ftp || !sftp) {
-        return -1;
+        return ftp ? sftp.error() : ftp.error();
     }
     const std::string script = renderRuleset(*firewall, servicePorts(*ftp, *sftp));
     return off ? removeRules(script) : replaceRules(script);

@@ -1,10 +1,12 @@
 #include "standalone/journal/admin_log.h"
 
 #include "base/plain_text.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/journal/catalogue.h"
+#include "standalone/journal/event_bus.h"
 #include "standalone/journal/log_database.h"
 #include "standalone/journal/request_actor.h"
 
@@ -31,34 +33,34 @@ Connection& connection() {
 }
 
 /// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held.
-/// Null, with the last error set, when it cannot be opened.
-LogDatabase* currentDatabase(Connection& open) {
+Result<LogDatabase*> currentDatabase(Connection& open) {
     if (open.database != nullptr && !open.database->isOwn()) {
-        fail(ErrorNumber::log,
-             "A process that was forked off while the administrator log was open cannot use it.");
-        return nullptr;
+        return Error(ErrorNumber::log,
+                     "A process that was forked off while the administrator log was open cannot use it.");
     }
     const std::filesystem::path path = statePath(paths::logDatabase);
     if (open.database == nullptr || !open.database->leadsTo(path)) {
         open.database.reset();
-        open.database = LogDatabase::open(path);
+        auto opened = LogDatabase::open(path);
+        if (!opened) {
+            return opened.error();
+        }
+        open.database = std::move(*opened);
     }
     return open.database.get();
 }
 
 /// Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
 std::optional<LogRetention> retentionIfReadable() {
-    const LastErrorKept kept;
-    const std::optional<LogRetention> retention = loadRetention();
+    const Result<LogRetention> retention = loadRetention();
     if (!retention) {
-        syslog(LOG_WARNING, "administrator log: nothing is removed: %s", lastErrorSentence().c_str());
+        syslog(LOG_WARNING, "administrator log: nothing is removed: %s", retention.error().message.c_str());
+        return std::nullopt;
     }
-    return retention;
+    return *retention;
 }
 
-} // namespace
-
-LogEntry makeLogEntry(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
+LogEntry makeEntry(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
     LogEntry entry;
     entry.time = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
     entry.category = category;
@@ -73,23 +75,35 @@ LogEntry makeLogEntry(int category, int level, unsigned event, const std::array<
     return entry;
 }
 
-int storeLogEntry(LogEntry& entry) {
+Result<> store(LogEntry& entry) {
     const std::optional<LogRetention> retention = retentionIfReadable();
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);
-    LogDatabase* database = currentDatabase(open);
-    return database == nullptr ? -1 : database->append(entry, retention);
+    const Result<LogDatabase*> database = currentDatabase(open);
+    return database ? (*database)->append(entry, retention) : database.error();
 }
 
-std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
+} // namespace
+
+Result<> logEvent(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
+    LogEntry entry = makeEntry(category, level, event, texts);
+    return perform(Effect::logEntry, entry.sentence, [&entry] {
+        Result<> stored = store(entry);
+        if (stored) {
+            publish(entry);
+        }
+        return stored;
+    });
+}
+
+Result<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
     if (filter.limit < 1 || filter.limit > longestPage) {
-        fail(ErrorNumber::invalid, "A page of the administrator log has 1 to 1000 entries.");
-        return std::nullopt;
+        return Error(ErrorNumber::invalid, "A page of the administrator log has 1 to 1000 entries.");
     }
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);
-    LogDatabase* database = currentDatabase(open);
-    return database == nullptr ? std::nullopt : database->query(filter);
+    const Result<LogDatabase*> database = currentDatabase(open);
+    return database ? (*database)->query(filter) : database.error();
 }
 
 } // namespace velt

@@ -2,7 +2,7 @@
 
 #include "base/file.h"
 #include "base/unique_fd.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
@@ -37,8 +37,8 @@ std::string renderTime(std::chrono::system_clock::time_point time) {
     return text;
 }
 
-int failToWrite(const std::filesystem::path& path, const char* why) {
-    return fail(ErrorNumber::event, "The event cannot be written to " + path.string() + ": " + why + ".");
+Error cannotWrite(const std::filesystem::path& path, const char* why) {
+    return {ErrorNumber::event, "The event cannot be written to " + path.string() + ": " + why + "."};
 }
 
 /// The file under its lock, which keeps other writers from adding their lines in between. Opened anew for
@@ -83,16 +83,16 @@ bool endsInALine(int fd, off_t size) {
 }
 
 /// A line that does not fit on the disk is taken back, or the next one would be lost with it.
-int writeLine(int fd, off_t size, const std::string& line, const std::filesystem::path& path) {
+Result<> writeLine(int fd, off_t size, const std::string& line, const std::filesystem::path& path) {
     const ssize_t written = ::write(fd, line.data(), line.size());
     if (written == static_cast<ssize_t>(line.size())) {
-        return 0;
+        return {};
     }
     const int error = written < 0 ? errno : ENOSPC;
     if (::ftruncate(fd, size) != 0) {
-        return failToWrite(path, "half a line is left in it");
+        return cannotWrite(path, "half a line is left in it");
     }
-    return failToWrite(path, std::strerror(error));
+    return cannotWrite(path, std::strerror(error));
 }
 
 } // namespace
@@ -114,11 +114,11 @@ std::string renderEvent(const SystemEvent& event) {
     return Json::writeString(builder, line);
 }
 
-int appendEvent(const SystemEvent& event) {
+Result<> appendEvent(const SystemEvent& event) {
     const std::filesystem::path path = statePath(paths::events);
     const std::string line = renderEvent(event) + "\n";
     if (line.size() > longestLine) {
-        return failToWrite(path, "it is longer than 64 KiB");
+        return cannotWrite(path, "it is longer than 64 KiB");
     }
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
@@ -131,7 +131,7 @@ int appendEvent(const SystemEvent& event) {
         size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
     }
     if (size < 0) {
-        return failToWrite(path, std::strerror(errno));
+        return cannotWrite(path, std::strerror(errno));
     }
     return writeLine(fd.get(), size, endsInALine(fd.get(), size) ? line : "\n" + line, path);
 }

@@ -3,6 +3,7 @@
 #ifndef VELT_STANDALONE_JOURNAL_EVENT_FILE_H
 #define VELT_STANDALONE_JOURNAL_EVENT_FILE_H
 
+#include "base/result.h"
 #include "standalone/journal/system_event.h"
 
 #include <cstddef>
@@ -20,8 +21,8 @@ inline constexpr int keptEventFiles = 4;
 
 /// Appends the event's line. Lines of several processes never mix, the file may be renamed away at any time,
 /// and a process that is killed at any moment leaves whole lines, of which none but the oldest file's are
-/// gone. Negative, with the last error set, when the line is longer than 64 KiB or cannot be written whole.
-int appendEvent(const SystemEvent& event);
+/// gone. A line of more than 64 KiB is refused.
+Result<> appendEvent(const SystemEvent& event);
 
 } // namespace velt
 

@@ -1,7 +1,7 @@
 #include "standalone/journal/log_database.h"
 
 #include "base/unique_fd.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -69,15 +69,15 @@ int switchToWal(sqlite3* database) {
 }
 
 /// Names and addresses are in it: SQLite would make the file readable to all. Its side files take its mode.
-int makeFile(const std::filesystem::path& path) {
+Result<> makeFile(const std::filesystem::path& path) {
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
     const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
     if (!fd) {
-        return fail(ErrorNumber::log, "The administrator log " + path.string() +
-                                          " cannot be opened: " + std::strerror(errno) + ".");
+        return Error(ErrorNumber::log, "The administrator log " + path.string() +
+                                           " cannot be opened: " + std::strerror(errno) + ".");
     }
-    return 0;
+    return {};
 }
 
 } // namespace
@@ -102,57 +102,60 @@ LogDatabase::~LogDatabase() {
     sqlite3_close(database_);
 }
 
-int LogDatabase::failHere(const char* what) const {
-    return fail(ErrorNumber::log, "The administrator log " + path_.string() + " cannot be " + what + ": " +
-                                      sqlite3_errmsg(database_) + ".");
+Error LogDatabase::cannotBe(const char* what) const {
+    return {ErrorNumber::log, "The administrator log " + path_.string() + " cannot be " + what + ": " +
+                                  sqlite3_errmsg(database_) + "."};
 }
 
-std::unique_ptr<LogDatabase> LogDatabase::open(const std::filesystem::path& path) {
-    if (makeFile(path) < 0) {
-        return nullptr;
+Result<std::unique_ptr<LogDatabase>> LogDatabase::open(const std::filesystem::path& path) {
+    if (auto made = makeFile(path); !made) {
+        return made.error();
     }
     std::unique_ptr<LogDatabase> log(new LogDatabase(path));
     const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
     if (sqlite3_open_v2(path.c_str(), &log->database_, flags, nullptr) != SQLITE_OK) {
-        log->failHere("opened");
-        return nullptr;
+        return log->cannotBe("opened");
     }
-    return log->prepare() < 0 ? nullptr : std::move(log);
+    if (auto prepared = log->prepare(); !prepared) {
+        return prepared.error();
+    }
+    return log;
 }
 
-int LogDatabase::prepare() {
+Result<> LogDatabase::prepare() {
     sqlite3_busy_timeout(database_, busyMilliseconds);
     // With the log ahead of the table, a commit that is not forced to the disk survives the end of the
     // process; a power failure may take the last entries, never the table's form.
     if (switchToWal(database_) != SQLITE_OK ||
         execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
-        return failHere("opened");
+        return cannotBe("opened");
     }
-    return makeTable() < 0 ? -1 : prepareStatements();
+    auto made = makeTable();
+    return made ? prepareStatements() : made;
 }
 
-int LogDatabase::makeTable() {
+Result<> LogDatabase::makeTable() {
     // Under the write lock, or two processes could both see that there is no table yet.
     if (execute(database_, "BEGIN IMMEDIATE") != SQLITE_OK) {
-        return failHere("opened");
+        return cannotBe("opened");
     }
     Statement version;
     if (version.prepare(database_, "PRAGMA user_version") != SQLITE_OK || version.step() != SQLITE_ROW) {
-        return failHere("opened");
+        return cannotBe("opened");
     }
     const std::int64_t found = version.number(0);
     version.reset();
     if (found != 0 && found != formVersion) {
-        return fail(ErrorNumber::log, "The administrator log " + path_.string() + " has form " +
-                                          std::to_string(found) + ", which this version does not know.");
+        return Error(ErrorNumber::log, "The administrator log " + path_.string() + " has form " +
+                                           std::to_string(found) + ", which this version does not know.");
     }
     if (found == 0 && execute(database_, tableSql) != SQLITE_OK) {
-        return failHere("made");
+        return cannotBe("made");
     }
-    return execute(database_, "COMMIT") == SQLITE_OK ? 0 : failHere("made");
+    return execute(database_, "COMMIT") == SQLITE_OK ? Result<>() : cannotBe("made");
 }
 
-int LogDatabase::prepareStatements() {
+Result<> LogDatabase::prepareStatements() {
     statements_ = std::make_unique<Statements>();
     const auto prepared = [this](Statement& statement, const char* sql) {
         return statement.prepare(database_, sql) == SQLITE_OK;
@@ -162,9 +165,9 @@ int LogDatabase::prepareStatements() {
         prepared(statements_->removeByCount, "DELETE FROM entry WHERE id <= ?1") &&
         prepared(statements_->removeByAge, "DELETE FROM entry WHERE time < ?1") &&
         prepared(statements_->query, querySql)) {
-        return 0;
+        return {};
     }
-    return failHere("used");
+    return cannotBe("used");
 }
 
 bool LogDatabase::isOwn() const {
@@ -177,9 +180,9 @@ bool LogDatabase::leadsTo(const std::filesystem::path& path) const {
            sqlite3_file_control(database_, "main", SQLITE_FCNTL_HAS_MOVED, &moved) == SQLITE_OK && moved == 0;
 }
 
-int LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& retention) {
+Result<> LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& retention) {
     if (statements_->begin.run() != SQLITE_DONE) {
-        return failHere("written");
+        return cannotBe("written");
     }
     int result = insert(entry);
     if (result == SQLITE_DONE && retention) {
@@ -189,13 +192,13 @@ int LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& rete
         result = statements_->commit.run();
     }
     if (result == SQLITE_DONE) {
-        return 0;
+        return {};
     }
-    failHere("written");
+    const Error error = cannotBe("written");
     if (sqlite3_get_autocommit(database_) == 0) {
         execute(database_, "ROLLBACK");
     }
-    return -1;
+    return error;
 }
 
 int LogDatabase::insert(LogEntry& entry) {
@@ -230,7 +233,7 @@ int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention
     return SQLITE_DONE;
 }
 
-std::optional<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
+Result<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
     Statement& query = statements_->query;
     query.bind(1, filter.since ? std::optional(millisecondsOf(*filter.since)) : std::nullopt);
     query.bind(2, filter.event ? std::optional(std::int64_t{*filter.event}) : std::nullopt);
@@ -253,11 +256,10 @@ std::optional<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter)
         entry.actor = query.text(10);
         entry.address = query.text(11);
     }
-    if (result != SQLITE_DONE) {
-        failHere("read");
-    }
+    Result<std::vector<LogEntry>> outcome =
+        result == SQLITE_DONE ? Result(std::move(entries)) : cannotBe("read");
     query.reset();
-    return result == SQLITE_DONE ? std::optional(std::move(entries)) : std::nullopt;
+    return outcome;
 }
 
 } // namespace velt

@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_JOURNAL_LOG_DATABASE_H
 #define VELT_STANDALONE_JOURNAL_LOG_DATABASE_H
 
+#include "base/result.h"
 #include "standalone/journal/log_entry.h"
 #include "standalone/journal/log_retention.h"
 #include "standalone/journal/statement.h"
@@ -18,9 +19,8 @@ namespace velt {
 /// Not thread-safe; several connections may be in use at once, in several processes, too.
 class LogDatabase {
 public:
-    /// Opens the database, which is made when it is missing. Null, with the last error set, when that is
-    /// impossible.
-    static std::unique_ptr<LogDatabase> open(const std::filesystem::path& path);
+    /// Opens the database, which is made when it is missing.
+    static Result<std::unique_ptr<LogDatabase>> open(const std::filesystem::path& path);
 
     /// Closes the connection, unless this process has it from its parent: its locks are the parent's.
     ~LogDatabase();
@@ -35,21 +35,21 @@ public:
     bool leadsTo(const std::filesystem::path& path) const;
 
     /// Adds the entry, whose id it sets, and removes what `retention` (when given) no longer keeps, together
-    /// or not at all. Negative, with the last error set, on failure.
-    int append(LogEntry& entry, const std::optional<LogRetention>& retention);
+    /// or not at all.
+    Result<> append(LogEntry& entry, const std::optional<LogRetention>& retention);
 
     /// As queryLog.
-    std::optional<std::vector<LogEntry>> query(const LogFilter& filter);
+    Result<std::vector<LogEntry>> query(const LogFilter& filter);
 
 private:
     explicit LogDatabase(std::filesystem::path path);
 
-    int prepare();
-    int makeTable();
-    int prepareStatements();
+    Result<> prepare();
+    Result<> makeTable();
+    Result<> prepareStatements();
     int insert(LogEntry& entry);
     int removeOld(const LogEntry& newest, const LogRetention& retention);
-    int failHere(const char* what) const;
+    Error cannotBe(const char* what) const;
 
     struct Statements;
 

@@ -1,7 +1,7 @@
 #include "standalone/ports/known_services.h"
 
 #include "base/file.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/ports/port_range.h"
@@ -10,7 +10,7 @@
 
 namespace velt {
 
-std::optional<std::vector<KnownService>> parseKnownServices(std::string_view text, const std::string& file) {
+Result<std::vector<KnownService>> parseKnownServices(std::string_view text, const std::string& file) {
     std::vector<KnownService> services;
     std::istringstream lines{std::string(text)};
     int number = 0;
@@ -25,22 +25,19 @@ std::optional<std::vector<KnownService>> parseKnownServices(std::string_view tex
         }
         const auto range = parsePortRange(ports);
         if (!range || !(words >> name) || words >> rest) {
-            fail(ErrorNumber::damaged,
-                 "Settings file " + file + ", line " + std::to_string(number) +
-                     ": this is not a port, or a range of ports, and a service's name.");
-            return std::nullopt;
+            return Error(ErrorNumber::damaged, "Cannot read " + file + ", line " + std::to_string(number) +
+                                                   ": expected a port or a range of ports, and a name.");
         }
         services.push_back({range->first, range->last, name});
     }
     return services;
 }
 
-std::optional<std::vector<KnownService>> loadKnownServices() {
+Result<std::vector<KnownService>> loadKnownServices() {
     const std::filesystem::path file = statePath(paths::knownServices);
     const auto text = readOptionalFile(file);
     if (!text) {
-        fail(text.error());
-        return std::nullopt;
+        return text.error();
     }
     return *text ? parseKnownServices(**text, file.string())
                  : parseKnownServices(shippedKnownServices, "known_services.conf, as shipped");

@@ -2,7 +2,8 @@
 #ifndef VELT_STANDALONE_PORTS_KNOWN_SERVICES_H
 #define VELT_STANDALONE_PORTS_KNOWN_SERVICES_H
 
-#include <optional>
+#include "base/result.h"
+
 #include <string>
 #include <string_view>
 #include <vector>
@@ -20,13 +21,12 @@ struct KnownService {
 /// The list that is shipped, as the text of its file.
 extern const std::string_view shippedKnownServices;
 
-/// Reads such a text; `file` names it in errors. Nothing, with the last error naming file and line, when a
-/// line is neither a service, a comment, nor blank.
-std::optional<std::vector<KnownService>> parseKnownServices(std::string_view text, const std::string& file);
+/// Reads such a text; `file` names it in errors. A line that is neither a service, a comment, nor blank is
+/// one.
+Result<std::vector<KnownService>> parseKnownServices(std::string_view text, const std::string& file);
 
-/// The administrator's list, /etc/velt/known_services.conf below the state root; the shipped one where there
-/// is none. Nothing, with the last error set, when it cannot be read.
-std::optional<std::vector<KnownService>> loadKnownServices();
+/// The administrator's list; the shipped one where there is none.
+Result<std::vector<KnownService>> loadKnownServices();
 
 } // namespace velt
 

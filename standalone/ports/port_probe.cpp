@@ -1,7 +1,7 @@
 #include "standalone/ports/port_probe.h"
 
 #include "base/unique_fd.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/process/listening_sockets.h"
 
 #include <netinet/in.h>
@@ -50,7 +50,7 @@ std::string describeListener(int port) {
     return describeOwner(owners.empty() ? SocketOwner{} : owners.begin()->second);
 }
 
-int probePorts(const std::vector<int>& ports, pid_t own) {
+Result<> probePorts(const std::vector<int>& ports, pid_t own) {
     for (const int port : ports) {
         if (own > 0 && listensOn(own, port)) {
             continue;
@@ -58,13 +58,13 @@ int probePorts(const std::vector<int>& ports, pid_t own) {
         const int error = tryPort(port);
         const std::string name = "Port " + std::to_string(port);
         if (error == EADDRINUSE) {
-            return fail(ErrorNumber::portTaken, name + " is in use by " + describeListener(port) + ".");
+            return Error(ErrorNumber::portTaken, name + " is in use by " + describeListener(port) + ".");
         }
         if (error != 0) {
-            return fail(ErrorNumber::daemon, name + " cannot be opened: " + std::strerror(error) + ".");
+            return Error(ErrorNumber::daemon, name + " cannot be opened: " + std::strerror(error) + ".");
         }
     }
-    return 0;
+    return {};
 }
 
 } // namespace velt

@@ -155,12 +155,11 @@ void unsubscribe(Subscription subscription) {
     }
 }
 
-std::optional<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
+Result<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
     FakeStandalone& fake = FakeStandalone::instance();
     fake.largestLimit = std::max(fake.largestLimit, filter.limit);
     if (fake.logFails) {
-        request().sentence = fake.sentence;
-        return std::nullopt;
+        return Error(fake.sentence);
     }
     std::vector<LogEntry> found;
     for (auto entry = fake.log.rbegin(); entry != fake.log.rend(); ++entry) {

@@ -137,7 +137,7 @@ int logAnew() {
 std::string readLog() {
     const auto entries = queryLog(LogFilter{});
     if (!entries) {
-        return unreadable();
+        return "unreadable: " + entries.error().message;
     }
     std::string text;
     for (const LogEntry& entry : *entries) {

@@ -1,8 +1,9 @@
 // The firewall's settings and rules as text.
 
-#include "standalone/core/last_error.h"
 #include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/ruleset.h"
+#include "tests/standalone/support/state_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
@@ -90,33 +91,44 @@ TEST(FirewallPorts, AreThoseOfTheEnabledServices) {
     EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2222-2222 ");
 }
 
-TEST(FirewallSettingsFile, IsReadAsWritten) {
-    const auto settings = parseFirewallSettings("# mine\nversion = 1\n\nmode=drop # careful\n"
-                                                "ports = 22 8000-8010\r\n",
-                                                "file");
-    ASSERT_TRUE(settings) << lastErrorSentence();
+class FirewallSettingsFile : public testing::Test {
+protected:
+    Result<FirewallSettings> load(const std::string& text) {
+        root_.write("etc/velt/firewall.conf", text);
+        return loadFirewallSettings();
+    }
+
+    test::StateFolder root_;
+};
+
+TEST_F(FirewallSettingsFile, IsReadAsWritten) {
+    EXPECT_EQ(loadFirewallSettings()->mode, FirewallMode::accept) << "without a file";
+    const auto settings = load("# mine\nversion = 1\n\nmode=drop # careful\nports = 22 8000-8010\r\n");
+    ASSERT_TRUE(settings) << settings.error().message;
     EXPECT_EQ(settings->mode, FirewallMode::drop);
     EXPECT_EQ(describe(settings->furtherPorts), "22-22 8000-8010 ");
-    EXPECT_EQ(parseFirewallSettings("version = 1\n", "file")->mode, FirewallMode::accept);
-    EXPECT_EQ(parseFirewallSettings("version = 1\nmode = off\n", "file")->mode, FirewallMode::off);
+    EXPECT_EQ(load("version = 1\n")->mode, FirewallMode::accept);
+    EXPECT_EQ(load("version = 1\nmode = off\n")->mode, FirewallMode::off);
 }
 
-TEST(FirewallSettingsFile, ThatIsDamagedIsNamedWithItsLine) {
-    const std::pair<const char*, const char*> damaged[] = {
-        {"", ": the key version is missing"},
-        {"mode = drop\n", ": the key version is missing"},
-        {"version = 2\n", ", line 1: version \"2\" is not known here"},
-        {"version = 1\nmode = open\n", ", line 2: the mode is none of off, accept and drop"},
-        {"version = 1\nmode\n", ", line 2: this is no line of the form \"key = value\""},
-        {"version = 1\nports = 22 0\n", ", line 2: \"0\" is neither a port nor a range of ports"},
-        {"version = 1\nports = 22; flush ruleset\n",
-         ", line 2: \"22;\" is neither a port nor a range of ports"},
-        {"version = 1\n\nmode = off\nmode = drop\n", ", line 4: the key mode stands there a second time"},
-        {"version = 1\ncolour = red\n", ", line 2: the key colour is not known"},
+TEST_F(FirewallSettingsFile, ThatIsDamagedIsNamedWithItsLine) {
+    const std::string portsExpected =
+        "ports: expected ports and ranges of ports with blanks between them, such as 22 8000-8010";
+    const std::pair<const char*, std::string> damaged[] = {
+        {"", ": missing key \"version\""},
+        {"mode = drop\n", ": missing key \"version\""},
+        {"version = 2\n",
+         ", line 1: version 2 is newer than this program, which knows files up to version 1"},
+        {"version = 1\nmode = open\n", ", line 2: mode: expected off, accept or drop"},
+        {"version = 1\nmode\n", ", line 2: expected \"key = value\""},
+        {"version = 1\nports = 22 0\n", ", line 2: " + portsExpected},
+        {"version = 1\nports = 22; flush ruleset\n", ", line 2: " + portsExpected},
+        {"version = 1\n\nmode = off\nmode = drop\n", ", line 4: duplicate key \"mode\""},
+        {"version = 1\ncolour = red\n", ", line 2: unknown key \"colour\""},
     };
     for (const auto& [text, complaint] : damaged) {
-        EXPECT_FALSE(parseFirewallSettings(text, "/x/firewall.conf"));
-        EXPECT_EQ(lastErrorSentence(), std::string("Settings file /x/firewall.conf") + complaint + ".");
+        EXPECT_EQ(test::messageOf(load(text)),
+                  "Cannot read " + (root_.path() / "etc/velt/firewall.conf").string() + complaint + ".");
     }
 }
 

@@ -6,6 +6,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 #include <sqlite3.h>
@@ -34,9 +35,9 @@ protected:
     }
 
     static std::vector<LogEntry> query(const LogFilter& filter = {}) {
-        std::optional<std::vector<LogEntry>> entries = queryLog(filter);
-        EXPECT_TRUE(entries) << lastErrorSentence();
-        return entries ? std::move(*entries) : std::vector<LogEntry>{};
+        const auto entries = queryLog(filter);
+        EXPECT_TRUE(entries) << entries.error().message;
+        return entries.valueOr({});
     }
 
     static void logUser(const std::string& name, unsigned event = 0x11B00024) {
@@ -120,8 +121,9 @@ TEST_F(AdminLogTest, NarrowsByEventActorAndTime) {
 
 TEST_F(AdminLogTest, RefusesAPageOfAnImpossibleSize) {
     for (const int limit : {0, -1, 1001}) {
-        EXPECT_FALSE(queryLog({{}, {}, {}, {}, limit}));
-        EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::invalid));
+        const auto refused = queryLog({{}, {}, {}, {}, limit});
+        ASSERT_FALSE(refused);
+        EXPECT_EQ(refused.error().number, ErrorNumber::invalid);
     }
 }
 
@@ -209,8 +211,8 @@ TEST_F(AdminLogTest, AFormFromTheFutureIsLeftAlone) {
     setStateRoot(other.path());
     logUser("elsewhere");
     setStateRoot(folder_.path());
-    EXPECT_FALSE(queryLog({}));
-    EXPECT_NE(lastErrorSentence().find("has form 2"), std::string::npos) << lastErrorSentence();
+    const std::string refused = test::messageOf(queryLog({}));
+    EXPECT_NE(refused.find("has form 2"), std::string::npos) << refused;
 }
 
 TEST_F(AdminLogTest, StartsAnewWhenTheFileWasMovedAway) {

@@ -24,7 +24,7 @@ std::map<std::string, int> countByActor() {
     LogFilter filter;
     for (filter.limit = 1000;;) {
         const auto page = queryLog(filter);
-        EXPECT_TRUE(page) << lastErrorSentence();
+        EXPECT_TRUE(page) << page.error().message;
         if (!page || page->empty())
             return counts;
         for (const LogEntry& entry : *page) {

@@ -1,11 +1,11 @@
 // Reading the kernel's tables, and opening ports on trial.
 
-#include "standalone/core/last_error.h"
 #include "standalone/ports/known_services.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/ports/port_range.h"
 #include "standalone/process/listening_sockets.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/result.h"
 
 #include <netinet/in.h>
 #include <sys/prctl.h>
@@ -92,19 +92,19 @@ TEST(ListeningSockets, HaveAnOwner) {
 
 TEST(PortProbe, TakesFreePortsAndLeavesThemFree) {
     const std::vector<int> ports{freePort(), freePort()};
-    EXPECT_EQ(probePorts(ports), 0) << lastErrorSentence();
-    EXPECT_EQ(probePorts(ports), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(probePorts(ports)), "");
+    EXPECT_EQ(messageOf(probePorts(ports)), "");
     const Listener listener(ports[1]);
 }
 
 TEST(PortProbe, NamesTheHolderUnlessItIsTheOneThatAsks) {
     const int port = freePort();
     const Listener listener(port);
-    EXPECT_LT(probePorts({freePort(), port}), 0);
-    EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) + " is in use by " +
-                                       std::string(program_invocation_short_name).substr(0, 15) +
-                                       " (process " + std::to_string(::getpid()) + ").");
-    EXPECT_EQ(probePorts({port}, ::getpid()), 0);
+    EXPECT_EQ(messageOf(probePorts({freePort(), port})),
+              "Port " + std::to_string(port) + " is in use by " +
+                  std::string(program_invocation_short_name).substr(0, 15) + " (process " +
+                  std::to_string(::getpid()) + ").");
+    EXPECT_EQ(messageOf(probePorts({port}, ::getpid())), "");
 }
 
 TEST(PortRange, IsReadStrictly) {
@@ -122,7 +122,7 @@ TEST(PortRange, IsReadStrictly) {
 
 TEST(KnownServices, ThatAreShippedCanBeRead) {
     const auto services = parseKnownServices(shippedKnownServices, "shipped");
-    ASSERT_TRUE(services) << lastErrorSentence();
+    ASSERT_TRUE(services) << services.error().message;
     EXPECT_GT(services->size(), 20U);
     EXPECT_EQ(services->front(), (KnownService{22, 22, "ssh"}));
 }

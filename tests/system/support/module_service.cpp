@@ -94,8 +94,8 @@ Json::Value ModuleService::getSftp() {
 
 std::vector<LogEntry> ModuleService::logEntries() const {
     auto entries = queryLog({});
-    EXPECT_TRUE(entries) << lastErrorSentence();
-    std::vector<LogEntry> found = entries.value_or(std::vector<LogEntry>{});
+    EXPECT_TRUE(entries) << entries.error().message;
+    std::vector<LogEntry> found = entries.valueOr({});
     std::erase_if(found, [this](const LogEntry& entry) { return entry.id <= lastEntry_; });
     std::ranges::reverse(found);
     return found;
