@@ -1,4 +1,4 @@
-// Asking a child process for what this one cannot try without changing itself.
+// Trying something in a child process that would change the whole process.
 #ifndef VELT_BASE_ASK_CHILD_H
 #define VELT_BASE_ASK_CHILD_H
 
@@ -8,8 +8,8 @@
 
 namespace velt {
 
-/// What `question` returns in a child process, which then ends. Other threads are not there in the child and
-/// may have held any lock: only system calls are safe in it. Thread-safe.
+/// Runs `question` in a child process and returns what it returned. The child has only this thread, and
+/// another one may have held any lock: only system calls are safe in `question`. Thread-safe.
 Result<int> askChild(const std::function<int()>& question);
 
 } // namespace velt

@@ -111,8 +111,8 @@ Result<> storeRuleLines(const std::vector<std::string>& lines) {
     for (const std::string& line : lines) {
         auto rule = parseRule(line);
         if (!rule)
-            return Error(ErrorNumber::invalid,
-                         "Chroot rule " + std::to_string(rules.size() + 1) + " cannot be read.");
+            return Error(ErrorNumber::invalid, "Chroot rule " + std::to_string(rules.size() + 1) + ": " +
+                                                   rule.error().message + ".");
         rules.push_back(std::move(*rule));
     }
     return storeRules(rules);
@@ -129,7 +129,7 @@ void copyText(const std::string& text, char* buffer) {
 Result<> splitRule(const char* line, int* isUser, char* name, int nameSize, char* path, int pathSize) {
     const auto rule = parseRule(line != nullptr ? line : "");
     if (!rule)
-        return rule.error();
+        return Error(rule.error().number, "Cannot read the chroot rule: " + rule.error().message + ".");
     const auto owner = ownerOf(*rule);
     if (!owner)
         return owner.error();

@@ -7,7 +7,7 @@
 namespace velt {
 namespace {
 
-// "" for a folder itself, ".." and more for one outside.
+// "" for the folder itself; begins with ".." when `place` is outside `outer`.
 std::filesystem::path within(const std::filesystem::path& place, const std::filesystem::path& outer) {
     const auto relative = place.lexically_relative(outer);
     return relative == "." ? std::filesystem::path() : relative;

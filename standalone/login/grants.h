@@ -1,4 +1,4 @@
-// What a login may do with the shares, and so with the folders in which they lie.
+// What a user may do with the shares, and with the folders around them.
 #ifndef VELT_STANDALONE_LOGIN_GRANTS_H
 #define VELT_STANDALONE_LOGIN_GRANTS_H
 
@@ -9,30 +9,30 @@
 
 namespace velt {
 
-/// Shares may lie within each other: the inner one then counts for its part of the outer one as well, and can
-/// take from what the outer one grants, but not add to it. Folders are told by their paths without symbolic
-/// links; a folder that is mounted at a second place as well is known at the place of its share only.
+/// A share may lie within another one. It can then take away from what the outer one grants, but not add to
+/// it. Folders are compared by their paths without symbolic links; if a folder is mounted in two places, only
+/// the share's own path counts.
 class Grants {
 public:
     /// Both must outlive this.
     Grants(const Identity& user, const std::vector<ShareEntry>& shares);
 
-    /// What the store grants and the file system allows, whichever is less; none also where the store says
-    /// nothing, or where the file system cannot be asked.
+    /// What the store grants or the file system allows, whichever is less; none when the store says nothing
+    /// or the check fails.
     Access on(const ShareEntry& share) const;
 
-    /// The least of `access` and of what the login may do with the shares below `outer` (a folder) in which
-    /// the folder `place` lies. Both paths are free of links.
+    /// `access`, limited by the shares below the folder `outer` that contain the folder `place`. Both paths
+    /// are without links.
     Access leastAt(const std::filesystem::path& place, const std::filesystem::path& outer,
                    Access access) const;
 
-    /// The shares strictly below `place` that the login may use less than by `access`.
+    /// The shares below `place` to which the user has less than `access`.
     std::vector<Restriction> restrictionsBelow(const std::filesystem::path& place, Access access) const;
 
 private:
     struct Known {
         const ShareEntry* share;
-        std::filesystem::path place; ///< free of links as far as it exists
+        std::filesystem::path place; ///< without links, as far as it exists
     };
 
     const Identity& user_;

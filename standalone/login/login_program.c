@@ -11,7 +11,7 @@
 #include <time.h>
 #include <unistd.h>
 
-/* Only the error output leads back; the client's connection and the server's keys are not the program's. */
+/* Nothing but the error output: the program must not get the client's connection or the server's keys. */
 static int describe_files(posix_spawn_file_actions_t* files, int errors) {
     int failure = posix_spawn_file_actions_adddup2(files, errors, STDERR_FILENO);
 
@@ -24,7 +24,7 @@ static int describe_files(posix_spawn_file_actions_t* files, int errors) {
     return failure != 0 ? failure : posix_spawn_file_actions_addclosefrom_np(files, STDERR_FILENO + 1);
 }
 
-/* No signal blocked or ignored, whatever the daemon does with its own. */
+/* The program starts with no signal blocked or ignored, whatever the daemon has set for itself. */
 static int describe_signals(posix_spawnattr_t* attributes) {
     sigset_t signals;
 
@@ -68,7 +68,7 @@ static long long milliseconds(void) {
     return (long long)now.tv_sec * 1000 + now.tv_nsec / 1000000;
 }
 
-/* Reads until the program has closed its end; FALSE when that takes too long. */
+/* Reads until the program closes its end. 0 when that takes too long. */
 static int read_words(int fd, long long deadline, char* words, size_t size) {
     char rest[256];
     size_t length = 0;
@@ -111,7 +111,7 @@ static void make_printable(char* words) {
     }
 }
 
-/* The end of a program that has closed its standard error is near, unless it hangs there. */
+/* A program that has closed its standard error ends soon, unless it hangs. */
 static int reap(pid_t child, long long deadline, int* status) {
     const struct timespec pause = {0, 1000000};
 
@@ -135,13 +135,13 @@ static int await(pid_t child, int errors, int limit, char* words, size_t size) {
         (void)kill(child, SIGKILL);
         /* It may be stuck in the kernel, where no signal ends it. */
         (void)reap(child, milliseconds() + 100, &status);
-        (void)snprintf(words, size, "it takes too long");
+        (void)snprintf(words, size, "no result within %d s", limit);
         return 0;
     }
     make_printable(words);
     if (!WIFEXITED(status) || WEXITSTATUS(status) != 0) {
         if (words[0] == '\0') {
-            (void)snprintf(words, size, "it ended without a word");
+            (void)snprintf(words, size, "failed without a reason");
         }
         return 0;
     }
@@ -157,7 +157,7 @@ int velt_run_login_program(char* const arguments[], int limit, char* words, size
         (void)snprintf(words, size, "%s", strerror(errno));
         return 0;
     }
-    /* Where the standard files are closed, the new ones must not take their places. */
+    /* If standard files are closed, the pipe could have taken their numbers. */
     int errors = fcntl(ends[1], F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
     int failure = errors < 0 ? errno : spawn(arguments, errors, &child);
     if (errors >= 0) {

@@ -1,13 +1,13 @@
-/* Running the program that makes the root directory of a login. */
+/* Running the program that makes the view of a login. */
 #ifndef VELT_STANDALONE_LOGIN_LOGIN_PROGRAM_H
 #define VELT_STANDALONE_LOGIN_LOGIN_PROGRAM_H
 
 #include <stddef.h>
 
-/* Runs the program, an absolute path, with these arguments, an empty environment and no file of this process,
- * for at most `limit` seconds. 1 when it ended with 0; else 0. `words` gets, cut to its size of at least 2
- * and in one line of printable characters, what the program wrote on its standard error or, when it did not
- * get that far, why. */
+/* Runs arguments[0], an absolute path, with these arguments, an empty environment and none of this process's
+ * files, for at most `limit` seconds. 1 when it ended with status 0, else 0. `words` gets what the program
+ * wrote to its standard error or, after a failure without that, the reason: one line of printable characters,
+ * cut to `size`, which is at least 2. */
 int velt_run_login_program(char* const arguments[], int limit, char* words, size_t size);
 
 #endif

@@ -20,7 +20,8 @@ Error refuse(std::string why, SourcePlace where = SourcePlace::current()) {
     return {ErrorNumber::invalid, std::move(why), where};
 }
 
-// A missing file is the same as no share, but for rules, which could have been taken away with their file.
+// Without the file there are no shares. A missing file of rules is an error: somebody may have removed it to
+// get rid of the rules.
 Result<std::vector<ShareEntry>> readShares() {
     const auto path = statePath(paths::shares);
     std::error_code error;
@@ -59,7 +60,7 @@ public:
     std::vector<std::string> remarks;
 
 private:
-    /// Shows a folder of which the login may use so much, seen from the share or home at `outer`.
+    /// Shows the folder with this access, limited by the shares between it and `outer`.
     Result<> showOne(UniqueFd folder, const std::filesystem::path& outer, Access access);
     Result<> addShare(SideBySide& view, const ShareEntry& share, Access access);
 
@@ -76,7 +77,7 @@ Result<> ViewMaker::showOne(UniqueFd folder, const std::filesystem::path& outer,
     }
     access = grants_.leastAt(*place, outer, access);
     if (access == Access::none) {
-        return refuse("The shares grant no access to " + place->string() + ".");
+        return refuse("The shares grant the user no access to " + place->string() + ".");
     }
     return showFolder(root_, {std::move(folder), access, grants_.restrictionsBelow(*place, access)});
 }
@@ -91,9 +92,9 @@ Result<> ViewMaker::showHome() {
         return place.error();
     }
     if (*place == "/") {
-        return refuse("The home is the root directory of the server.");
+        return refuse("The user's home is \"/\", the whole server.");
     }
-    // Of the shares around the home none counts: it is the user's own. A share that is the home counts.
+    // Shares around the home do not count, since it is the user's own; a share that is the home does.
     return showOne(std::move(*home), place->parent_path(), Access::write);
 }
 
@@ -101,11 +102,11 @@ Result<> ViewMaker::showInShare(const std::string& path) {
     const auto end = std::min(path.find('/', 1), path.size());
     const auto share = std::ranges::find(shares_, path.substr(1, end - 1), &ShareEntry::name);
     if (share == shares_.end()) {
-        return refuse("There is no share for " + path + ".");
+        return refuse("There is no share for the path " + path + ".");
     }
     const Access access = grants_.on(*share);
     if (access == Access::none) {
-        return refuse("The share " + share->name + " grants no access.");
+        return refuse("The share " + share->name + " grants the user no access.");
     }
     auto folder = openFolderAs(login_.user, share->path);
     if (!folder) {
@@ -160,7 +161,7 @@ Result<> ViewMaker::showToAnonymous() {
     }
     const auto share = std::ranges::find(shares_, *name, &ShareEntry::name);
     if (share == shares_.end() || !share->offeredToFtp) {
-        return refuse("The share for anonymous users is gone, or is not offered to FTP.");
+        return refuse("The share for anonymous users does not exist, or is not offered to FTP.");
     }
     return showInShare("/" + *name);
 }
@@ -188,7 +189,7 @@ Result<std::vector<std::string>> makeLoginView(const Login& login, const std::fi
     }
     if (login.view == DefaultView::server) {
         return rule ? Result<std::vector<std::string>>(
-                          refuse("A login cannot be confined without root's rights."))
+                          refuse("Without root's rights a login cannot be confined."))
                     : std::vector<std::string>();
     }
     const auto shares = readShares();

@@ -19,7 +19,7 @@ enum class DefaultView {
     server,    ///< everything, with the rights that the daemon has; a login with a rule is refused
 };
 
-/// A login, as the daemon tells of it.
+/// A login, as the daemon describes it.
 struct Login {
     DefaultView view = DefaultView::home;
     Identity user;
@@ -27,10 +27,10 @@ struct Login {
     std::filesystem::path anonymousShare; ///< a file that holds the name of a share; "": all shares
 };
 
-/// Makes `root`, an existing folder, show what the login may see: by the chroot rule that it follows, else
-/// its default view; with what the store grants on the shares. All this happens in the mount namespace of
-/// this process, which must be no one else's but the session's. Gives a sentence for each share that had to
-/// be left out. After an error the login is to be refused.
+/// Makes `root`, an existing folder, show what the login may see: the folder of the user's chroot rule, else
+/// the default view, with the access that the shares grant. It mounts in this process's mount namespace,
+/// which must belong to the session alone. Returns one sentence for each share that is left out. After an
+/// error the login must be refused.
 Result<std::vector<std::string>> makeLoginView(const Login& login, const std::filesystem::path& root);
 
 } // namespace velt

@@ -1,13 +1,12 @@
 // velt-login-view STATE VIEW ROOT USER UID GIDS HOME [FILE]
 //
 // Makes the folder ROOT show what a login of the FTP daemon may see, in the mount namespace of the session
-// that started this program, and ends: with 0 when the session may go on with ROOT as its root directory,
-// else with why not on standard error. Nobody else sees anything of it, and it is gone when the session has
-// ended.
+// that started this program. Ends with 0 when the session may use ROOT as its root directory, else with the
+// reason on standard error. Nobody else sees the view, and it goes with the session.
 //
 // STATE is the state root; VIEW is "home", "shares", "anonymous" or "server", as in login_view.h; GIDS are
-// the numbers of the user's groups, the primary one first, separated by commas; FILE names the share of
-// anonymous users.
+// the numbers of the user's groups, the primary one first, separated by commas; FILE holds the name
+// of the share for anonymous users.
 #include "base/plain_text.h"
 #include "standalone/core/state_root.h"
 #include "standalone/login/login_view.h"
@@ -35,7 +34,7 @@ constexpr std::array<std::string_view, 4> views{"home", "shares", "anonymous", "
 std::optional<unsigned> numberOf(std::string_view text) {
     unsigned number = 0;
     const auto [rest, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    // The greatest number means "no one" to the kernel.
+    // The greatest number means "no change" to the kernel.
     const bool whole = error == std::errc() && rest == text.data() + text.size();
     return whole && number != static_cast<unsigned>(-1) ? std::optional(number) : std::nullopt;
 }
@@ -72,7 +71,7 @@ std::optional<velt::Login> loginOf(int count, char** arguments) {
                        count == 9 ? arguments[8] : ""};
 }
 
-// The daemon has put a user's numbers in the place of some of root's.
+// The daemon may have left some of the numbers at a user's.
 bool becomeRoot() {
     return getuid() != 0 ||
            (setgroups(0, nullptr) == 0 && setresgid(0, 0, 0) == 0 && setresuid(0, 0, 0) == 0);
@@ -90,7 +89,7 @@ int run(int count, char** arguments) {
     }
     umask(022);
     if (!becomeRoot()) {
-        return refuse("Root's rights cannot be taken.");
+        return refuse("Cannot take on root's rights.");
     }
     velt::setStateRoot(arguments[1]);
     const auto remarks = velt::makeLoginView(*login, arguments[3]);

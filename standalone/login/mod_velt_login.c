@@ -1,10 +1,10 @@
-/* Gives each login the root directory that is made for it.
+/* Shows each login what it may see, and nothing else.
  *
- * As soon as a password is right, the session gets a mount namespace of its own, in which a program of ours
- * (VeltLoginView) makes one folder show what the login may see. That folder is the DefaultRoot, and the
- * directory of <Anonymous>, in the configuration. It is empty for everybody else, so that a session which
- * were led there without us would see nothing. Where the program refuses a login, the password counts as
- * wrong.
+ * Once the password has been accepted, the session gets its own mount namespace. There the program named by
+ * VeltLoginView makes one folder show what the login may see. The configuration has that folder as the
+ * DefaultRoot and as the directory of <Anonymous>. For everybody else the folder is empty, so a session that
+ * gets there without this module sees nothing. When the program refuses, the login fails as with a wrong
+ * password.
  */
 #include "conf.h"
 #include "privs.h"
@@ -17,19 +17,20 @@
 
 module velt_login_module;
 
-/* Far more than a login takes, and less than clients wait. */
+/* In seconds: far more than a login takes, and less than clients wait. */
 static const int longest_run = 20;
 
-/* For whom this session's view was made; a login that fails later may be followed by another user's. */
+/* The user this session's view was made for. The login may still fail, and another user try next. */
 static const char* made_for = NULL;
 
-/* "1000,1000,27": the primary group, then all that the daemon knows of. NULL when they cannot be told. */
+/* "1000,1000,27": the primary group, then all that the daemon knows of. NULL when they cannot be
+ * looked up. */
 static char* groups_text(pool* p, const struct passwd* pw) {
     array_header* gids = NULL;
     array_header* names = NULL;
 
-    /* Every source tells the primary group at least; without an answer, rules and refusals of groups would
-     * be skipped. */
+    /* Every source knows the primary group at least. Without an answer the rules and refusals of groups
+     * would be skipped. */
     char* text = pstrcat(p, pr_gid2str(p, pw->pw_gid), NULL);
     if (pr_auth_getgroups(p, pw->pw_name, &gids, &names) < 0) {
         return NULL;
@@ -40,7 +41,7 @@ static char* groups_text(pool* p, const struct passwd* pw) {
     return text;
 }
 
-/* The look-ups that follow may reuse what the daemon's answer points to. */
+/* A copy: later look-ups may overwrite the daemon's answer. */
 static struct passwd* copy_account(pool* p, const char* user) {
     const struct passwd* known = user != NULL ? pr_auth_getpwnam(p, user) : NULL;
     if (known == NULL || known->pw_name == NULL || known->pw_dir == NULL) {
@@ -55,7 +56,7 @@ static struct passwd* copy_account(pool* p, const char* user) {
 }
 
 static int run_program(pool* p, const config_rec* c, const char* kind, const char* root, const char* user) {
-    char words[1024] = "the account cannot be told";
+    char words[1024] = "cannot look up the account or its groups";
     int good = FALSE;
 
     struct passwd* pw = copy_account(p, user);
@@ -71,13 +72,13 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
                              pw->pw_dir,
                              c->argc > 3 && session.anon_config != NULL ? c->argv[3] : NULL,
                              NULL};
-        /* Only where everything may be seen there is nothing to be made. */
+        /* Where everything may be seen, no view is made. */
         int isolated = strcmp(kind, "server") != 0;
         PRIVS_ROOT
         if (isolated && strcmp(root, "/") == 0) {
-            (void)snprintf(words, sizeof(words), "no DefaultRoot to be made");
+            (void)snprintf(words, sizeof(words), "DefaultRoot is missing from the configuration");
         } else if (isolated && unshare(CLONE_NEWNS) < 0) {
-            (void)snprintf(words, sizeof(words), "no mount namespace: %s", strerror(errno));
+            (void)snprintf(words, sizeof(words), "cannot make a mount namespace: %s", strerror(errno));
         } else {
             good = velt_run_login_program(arguments, longest_run, words, sizeof(words));
         }
@@ -98,7 +99,8 @@ static int make_view(const char* root, int anonymous) {
 
     made_for = NULL;
     if (c == NULL || user == NULL) {
-        pr_log_pri(PR_LOG_ERR, MODULE_VERSION ": login refused: no VeltLoginView");
+        pr_log_pri(PR_LOG_ERR,
+                   MODULE_VERSION ": login refused: VeltLoginView is missing from the configuration");
         return FALSE;
     }
     pool* p = make_sub_pool(session.pool);
@@ -112,7 +114,7 @@ static int make_view(const char* root, int anonymous) {
 
 /* A local user's password has been checked. */
 static void on_authenticated(const void* data, void* ignored) {
-    /* The daemon goes by what stands here when all listeners have been told. */
+    /* The daemon reads the code again after all listeners. */
     int* code = (int*)data;
     (void)ignored;
 
@@ -144,11 +146,11 @@ static void on_chroot(const void* root, void* ignored) {
 /* usage: VeltLoginView program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
 MODRET set_velt_login_view(cmd_rec* cmd) {
     if (cmd->argc < 4 || cmd->argc > 5) {
-        CONF_ERROR(cmd, "wrong number of parameters");
+        CONF_ERROR(cmd, "expected 3 or 4 parameters");
     }
     CHECK_CONF(cmd, CONF_ROOT);
     if (*(const char*)cmd->argv[1] != '/' || *(const char*)cmd->argv[2] != '/') {
-        CONF_ERROR(cmd, "needs absolute paths");
+        CONF_ERROR(cmd, "expected absolute paths");
     }
     if (cmd->argc == 5) {
         (void)add_config_param_str(cmd->argv[0], 4, cmd->argv[1], cmd->argv[2], cmd->argv[3], cmd->argv[4]);

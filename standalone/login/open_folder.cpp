@@ -18,14 +18,14 @@ namespace {
 
 constexpr int asFolder = O_PATH | O_DIRECTORY | O_CLOEXEC;
 
-// While it lives, files are opened as the user would open them: the kernel takes root's capabilities over
-// files away with the number.
+// While it lives, files are opened with the user's rights: with the user's number for file access the kernel
+// also drops root's capabilities over files.
 class FileRightsOf {
 public:
     explicit FileRightsOf(const Identity& user) : taken_(setgroups(user.gids.size(), user.gids.data()) == 0) {
         setfsgid(user.gids.front());
         setfsuid(user.uid);
-        // Neither call tells whether it failed, but each answers who it was before.
+        // Neither call reports a failure, but each returns the number before it.
         taken_ = taken_ && static_cast<uid_t>(setfsuid(user.uid)) == user.uid &&
                  static_cast<gid_t>(setfsgid(user.gids.front())) == user.gids.front();
     }
@@ -48,7 +48,7 @@ Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& 
     open_how how{};
     how.flags = asFolder;
     how.resolve = resolve;
-    // The kernel gives up when folders move while it follows a path that must stay below one.
+    // The kernel gives up (EAGAIN) when folders are moved while it resolves the path.
     for (int attempt = 0; attempt < 100; attempt++) {
         const long fd = syscall(SYS_openat2, folder.get(), path.c_str(), &how, sizeof how);
         if (fd >= 0) {
@@ -91,10 +91,10 @@ Result<std::filesystem::path> placeOf(const UniqueFd& folder) {
         std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(folder.get()), error);
     struct stat here {};
     struct stat there {};
-    // The kernel marks the place of a removed folder in words that could be a name as well.
+    // The kernel marks a removed folder with " (deleted)", which could also be part of a name.
     if (error || fstat(folder.get(), &here) < 0 || stat(place.c_str(), &there) < 0 ||
         here.st_dev != there.st_dev || here.st_ino != there.st_ino) {
-        return Error(ErrorNumber::store, "The place of the folder cannot be told.");
+        return Error(ErrorNumber::store, "The folder was removed or moved during the login.");
     }
     return place;
 }

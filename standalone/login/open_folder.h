@@ -1,4 +1,4 @@
-// Opening folders of which parts may be under the control of the one who logs in.
+// Opening folders whose paths the user who logs in may be able to change.
 #ifndef VELT_STANDALONE_LOGIN_OPEN_FOLDER_H
 #define VELT_STANDALONE_LOGIN_OPEN_FOLDER_H
 
@@ -10,24 +10,24 @@
 
 namespace velt {
 
-// Each opens for the use of the folder as such (O_PATH).
+// The descriptors only refer to the folders (O_PATH).
 
-/// With root's rights and through all symbolic links.
+/// With root's rights; follows symbolic links.
 Result<UniqueFd> openFolder(const std::filesystem::path& path);
 
-/// With the rights of the user, for a path that the user may have laid: a home, or a share within one that
-/// the user may write.
+/// With the user's rights; follows symbolic links. For a path that the user may have made: a home, or a share
+/// within a writable one.
 Result<UniqueFd> openFolderAs(const Identity& user, const std::filesystem::path& path);
 
-/// With the rights of the user, and never outside of `folder`, whoever moves folders and links meanwhile.
-/// `path` is relative and not empty.
+/// With the user's rights, and never outside `folder`, even while folders and links are being moved. `path`
+/// is relative and not empty.
 Result<UniqueFd> openFolderBelow(const Identity& user, const UniqueFd& folder,
                                  const std::filesystem::path& path);
 
-/// With root's rights, `path` as it is, which must not lead through a symbolic link.
+/// With root's rights; an error when `path` leads through a symbolic link.
 Result<UniqueFd> openFolderExactly(const UniqueFd& folder, const std::filesystem::path& path);
 
-/// Where an open folder lies, free of links. An error when it has been removed or moved meanwhile.
+/// The path of an open folder, without links. An error when the folder has been removed or moved.
 Result<std::filesystem::path> placeOf(const UniqueFd& folder);
 
 } // namespace velt

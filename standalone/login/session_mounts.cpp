@@ -27,9 +27,8 @@ Result<> checkSessionMounts() {
     }
     if (*error != 0) {
         return Error(ErrorNumber::daemon,
-                     std::string("The FTP service cannot confine its sessions here: mounts of their own are "
-                                 "not possible (") +
-                         std::strerror(*error) + ").");
+                     std::string("FTP sessions cannot be confined here: cannot make a mount namespace: ") +
+                         std::strerror(*error) + ".");
     }
     return {};
 }

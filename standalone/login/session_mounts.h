@@ -1,4 +1,4 @@
-// Whether FTP sessions can have mounts of their own.
+// Whether FTP sessions can have their own mounts.
 #ifndef VELT_STANDALONE_LOGIN_SESSION_MOUNTS_H
 #define VELT_STANDALONE_LOGIN_SESSION_MOUNTS_H
 
@@ -6,7 +6,7 @@
 
 namespace velt {
 
-/// Tries in a child process what each login needs. An error when it is not allowed here. Thread-safe.
+/// Tries in a child process what each login needs; an error when this process may not do it. Thread-safe.
 Result<> checkSessionMounts();
 
 } // namespace velt

@@ -22,9 +22,9 @@ Result<> outcome(bool good, const std::string& what) {
     return good ? Result<>() : failed(what);
 }
 
-// A second mount of the folder and of what is mounted below it, not yet attached. It adds to what the mounts
-// are restricted by already; a plain remount would lift that. What is mounted on the server later stays away,
-// since that would come without the restrictions.
+// Another mount of the folder, with all mounts below it, not yet attached. Existing restrictions of these
+// mounts stay; a plain remount would lift them. What the server mounts later does not appear in it, since
+// that would come without the restrictions.
 UniqueFd mountOf(const UniqueFd& folder, Access access) {
     UniqueFd tree(
         open_tree(folder.get(), "", OPEN_TREE_CLONE | OPEN_TREE_CLOEXEC | AT_EMPTY_PATH | AT_RECURSIVE));
@@ -39,7 +39,7 @@ UniqueFd mountOf(const UniqueFd& folder, Access access) {
     return tree;
 }
 
-// A folder that cannot even be listed.
+// An empty folder that cannot even be listed.
 UniqueFd nothing() {
     const UniqueFd context(fsopen("tmpfs", FSOPEN_CLOEXEC));
     if (!context || fsconfig(context.get(), FSCONFIG_SET_STRING, "mode", "0000", 0) != 0 ||
@@ -68,7 +68,7 @@ Result<> coverOne(const UniqueFd& tree, const Restriction& restriction) {
     const UniqueFd cover =
         restriction.access == Access::none ? nothing() : mountOf(*folder, restriction.access);
     return outcome(cover && attach(cover, *folder),
-                   "The folder " + restriction.place.string() + " of another share cannot be restricted");
+                   "Cannot restrict the folder " + restriction.place.string() + " of another share");
 }
 
 Result<> restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& restrictions) {
@@ -88,7 +88,7 @@ Result<> restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& re
     return {};
 }
 
-/// The folder's mount, with all of its rights, at `place`.
+/// Mounts the folder at `place`, without its restrictions yet.
 Result<UniqueFd> mountAt(const std::filesystem::path& place, const VisibleFolder& visible) {
     const auto where = openFolder(place);
     if (!where) {
@@ -96,7 +96,7 @@ Result<UniqueFd> mountAt(const std::filesystem::path& place, const VisibleFolder
     }
     UniqueFd tree = mountOf(visible.folder, visible.access);
     if (!tree || !attach(tree, *where)) {
-        return failed("The folder cannot be mounted");
+        return failed("Cannot mount the folder");
     }
     return tree;
 }
@@ -104,9 +104,9 @@ Result<UniqueFd> mountAt(const std::filesystem::path& place, const VisibleFolder
 } // namespace
 
 Result<> isolateMounts() {
-    // What the server unmounts goes here, too, so that a session does not keep it.
+    // Slave, not private: what the server unmounts goes away here as well, so that no session keeps it busy.
     return outcome(mount(nullptr, "/", nullptr, MS_REC | MS_SLAVE, nullptr) == 0,
-                   "The mounts of the session cannot be separated");
+                   "Cannot separate the mounts of the session from the server's");
 }
 
 Result<> showFolder(const std::filesystem::path& root, const VisibleFolder& visible) {
@@ -117,17 +117,17 @@ Result<> showFolder(const std::filesystem::path& root, const VisibleFolder& visi
 Result<> SideBySide::begin() {
     return outcome(mount("velt-shares", root_.c_str(), "tmpfs", MS_NOSUID | MS_NODEV | MS_NOEXEC,
                          "mode=0755,size=16m") == 0,
-                   "The folder of the shares cannot be mounted");
+                   "Cannot mount the folder of the shares");
 }
 
 Result<> SideBySide::add(const std::string& name, const VisibleFolder& visible) {
     const std::filesystem::path place = root_ / name;
     if (mkdir(place.c_str(), 0755) < 0) {
-        return failed("The place of the share cannot be made");
+        return failed("Cannot make the folder of the share");
     }
     const auto tree = mountAt(place, visible);
     const Result<> shown = tree ? restrictWithin(*tree, visible.restrictions) : tree.error();
-    // It must not stay there with more rights than it should give.
+    // A share without its restrictions must not stay.
     if (!shown && ((tree && umount2(place.c_str(), MNT_DETACH) < 0) || rmdir(place.c_str()) < 0)) {
         spoiled_ = true;
     }
@@ -136,12 +136,11 @@ Result<> SideBySide::add(const std::string& name, const VisibleFolder& visible) 
 
 Result<> SideBySide::finish() {
     if (spoiled_) {
-        return Error(ErrorNumber::daemon,
-                     "A share that could not be restricted could not be taken away again.");
+        return Error(ErrorNumber::daemon, "Cannot take away a share that could not be restricted.");
     }
     return outcome(mount(nullptr, root_.c_str(), nullptr,
                          MS_REMOUNT | MS_BIND | MS_RDONLY | MS_NOSUID | MS_NODEV, nullptr) == 0,
-                   "The folder of the shares cannot be made read-only");
+                   "Cannot make the folder of the shares read-only");
 }
 
 } // namespace velt

@@ -1,4 +1,4 @@
-// The file tree that a login sees, made of mounts in this process's own mount namespace.
+// The file tree that a login sees, made of mounts in this process's mount namespace.
 #ifndef VELT_STANDALONE_LOGIN_VIEW_MOUNTS_H
 #define VELT_STANDALONE_LOGIN_VIEW_MOUNTS_H
 
@@ -12,10 +12,10 @@
 
 namespace velt {
 
-/// A folder within a visible one that may be used less than what is around it.
+/// A folder within a visible one to which there is less access.
 struct Restriction {
-    std::filesystem::path place;  ///< relative to the visible folder, free of links; outer ones come first
-    Access access = Access::none; ///< none: nothing of it can be seen
+    std::filesystem::path place;  ///< relative to the visible folder, without links; outer ones come first
+    Access access = Access::none; ///< none: it looks empty
 };
 
 struct VisibleFolder {
@@ -24,10 +24,10 @@ struct VisibleFolder {
     std::vector<Restriction> restrictions;
 };
 
-/// Lets nothing that is mounted from now on reach other mount namespaces.
+/// From now on no mount made here reaches other mount namespaces.
 Result<> isolateMounts();
 
-/// Makes `root` show this folder. After an error `root` must not be used: it may show more.
+/// Makes `root` show this folder. After an error `root` must not be used: it may show too much.
 Result<> showFolder(const std::filesystem::path& root, const VisibleFolder& visible);
 
 /// Several folders side by side below a root in which nothing else can be made.
@@ -37,14 +37,14 @@ public:
 
     /// To be called first.
     Result<> begin();
-    /// An error when the folder cannot be shown exactly so; it is left out then.
+    /// After an error the folder is left out.
     Result<> add(const std::string& name, const VisibleFolder& visible);
     /// To be called last. After an error the root must not be used.
     Result<> finish();
 
 private:
     std::filesystem::path root_;
-    bool spoiled_ = false; ///< something is there with more rights than it should give
+    bool spoiled_ = false; ///< a folder that gives too much could not be removed
 };
 
 } // namespace velt

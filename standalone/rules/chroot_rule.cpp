@@ -50,7 +50,8 @@ std::string formatRule(const ChrootRule& rule) {
 }
 
 Result<ChrootRule> parseRule(std::string_view line) {
-    const Error refused(ErrorNumber::damaged, "The chroot rule cannot be read.");
+    const Error refused(ErrorNumber::damaged,
+                        "expected a rule like \"u:1000:/share/folder\" or \"g:100:/home\"");
     if (line.size() > longestRule || !(line.starts_with("u:") || line.starts_with("g:"))) {
         return refused;
     }
@@ -62,7 +63,7 @@ Result<ChrootRule> parseRule(std::string_view line) {
         return refused;
     }
     rule.path.assign(rest + 1, end);
-    // One rule has one line form; another one would not be found again by it.
+    // Each rule has exactly one line form, so that lines can be compared.
     if (!isRulePath(rule.path) || formatRule(rule) != line) {
         return refused;
     }

@@ -27,8 +27,8 @@ inline constexpr std::string_view homePath = "/home";
 /// The longest line of a rule, in bytes.
 inline constexpr std::size_t longestRule = 2047;
 
-/// Whether a rule can have this path: "/home", or a share's name and perhaps folders below it, without empty
-/// components, "." and "..", and without control characters.
+/// Whether a rule can have this path: "/home", or "/" and a share's name, perhaps with folders below it;
+/// without empty components, ".", ".." and control characters.
 bool isRulePath(std::string_view path);
 
 /// The rule for the user or group with this number. Slashes at the end of the path are dropped.
@@ -37,14 +37,14 @@ Result<ChrootRule> makeRule(bool isUser, int id, std::string path);
 /// "u:1000:/share/below" for a user's rule, "g:100:/home" for a group's.
 std::string formatRule(const ChrootRule& rule);
 
-/// Reads what formatRule makes, and nothing else.
+/// Reads what formatRule makes, and nothing else. The error's message is a part of a sentence.
 Result<ChrootRule> parseRule(std::string_view line);
 
-/// The name of the user or group that the rule is for. An error when the number is nobody's.
+/// The name of the user or group that the rule is for. An error when nobody has the number.
 Result<std::string> ownerOf(const ChrootRule& rule);
 
-/// The rule that a login follows: the first one of the user, else the first one of a group of the user's;
-/// null when there is none.
+/// The rule that a login follows: the user's first one, else the first one of a group with these numbers.
+/// Null when there is none.
 const ChrootRule* ruleFor(const std::vector<ChrootRule>& rules, uid_t uid, const std::vector<gid_t>& gids);
 
 } // namespace velt

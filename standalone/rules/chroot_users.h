@@ -1,4 +1,4 @@
-// The chroot users: those whose rule confines them to their own home.
+// The chroot users: those with a rule that confines them to their home.
 //
 // All of it works on the stored rules and may be called from any thread.
 #ifndef VELT_STANDALONE_RULES_CHROOT_USERS_H
@@ -19,11 +19,11 @@ Result<std::vector<std::string>> chrootUsers(const UserFilter& filter);
 /// The names of the listed users who are not chroot users.
 Result<std::vector<std::string>> otherUsers(const UserFilter& filter);
 
-/// Gives each of these users a rule for the own home, in place of any other rule of that user. A name may
-/// come twice. Nothing is changed when one of them is nobody's.
+/// Gives each of these users a rule for the home, in place of any other rule of the user. A name may come
+/// twice. Nothing changes when there is no user of one of the names.
 Result<> addChrootUsers(const std::vector<std::string>& names);
 
-/// Takes the rule for the own home from each of these users; other rules of theirs stay. As above otherwise.
+/// Takes the rule for the home from each of these users; their other rules stay. As above otherwise.
 Result<> deleteChrootUsers(const std::vector<std::string>& names);
 
 } // namespace velt

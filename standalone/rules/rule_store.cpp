@@ -16,9 +16,9 @@ std::filesystem::path rulesFile() {
     return statePath(paths::chrootRules);
 }
 
-Error damaged(int lineNumber) {
+Error damaged(int lineNumber, const std::string& why) {
     return {ErrorNumber::damaged,
-            "Line " + std::to_string(lineNumber) + " of " + rulesFile().string() + " is damaged."};
+            rulesFile().string() + ", line " + std::to_string(lineNumber) + ": " + why + "."};
 }
 
 } // namespace
@@ -28,19 +28,19 @@ Result<std::vector<ChrootRule>> parseRules(std::string_view text) {
     for (int number = 1; number == 1 || !text.empty(); number++) {
         const auto end = text.find('\n');
         if (end == std::string_view::npos) {
-            return damaged(number);
+            return damaged(number, "the line is cut off");
         }
         const auto line = text.substr(0, end);
         text.remove_prefix(end + 1);
         if (number == 1) {
             if (line != versionLine) {
-                return damaged(number);
+                return damaged(number, "expected \"" + std::string(versionLine) + "\"");
             }
             continue;
         }
         auto rule = parseRule(line);
         if (!rule) {
-            return damaged(number);
+            return damaged(number, rule.error().message);
         }
         rules.push_back(std::move(*rule));
     }
@@ -74,14 +74,14 @@ Result<> makeRulesFile() {
     if (!lock) {
         return lock.error();
     }
-    // A file that is there and cannot be read, or a link to a disk that is not mounted, holds rules that an
-    // empty set would take away.
+    // Only where there is nothing: an unreadable file, or a link to a disk that is not mounted, holds rules
+    // that an empty set would replace.
     std::error_code error;
     if (std::filesystem::symlink_status(rulesFile(), error).type() == std::filesystem::file_type::not_found) {
         return storeRules({});
     }
     if (!std::filesystem::exists(rulesFile(), error)) {
-        return Error(ErrorNumber::store, "The file " + rulesFile().string() + " cannot be reached.");
+        return cannot("open", rulesFile(), error ? error.value() : ENOENT);
     }
     return {};
 }

@@ -1,5 +1,5 @@
-// The stored chroot rules: "/etc/velt/chroot_rules" below the state root, a version line and then one rule a
-// line.
+// The stored chroot rules: "/etc/velt/chroot_rules" below the state root, a version line and then one line
+// for each rule.
 #ifndef VELT_STANDALONE_RULES_RULE_STORE_H
 #define VELT_STANDALONE_RULES_RULE_STORE_H
 

@@ -35,8 +35,7 @@ int askKernel(const char* path, const Identity& who, bool changeIdentity) {
 }
 
 Error cannotAsk(const std::string& path, const char* why) {
-    return {ErrorNumber::invalid,
-            "What the file system allows on " + path + " cannot be asked: " + why + "."};
+    return {ErrorNumber::invalid, "Cannot check the access to " + path + ": " + why + "."};
 }
 
 } // namespace
@@ -44,7 +43,7 @@ Error cannotAsk(const std::string& path, const char* why) {
 Result<Access> folderAccess(const std::string& path, const Identity& who) {
     const bool changeIdentity = geteuid() == 0;
     if (!changeIdentity && who.uid != geteuid()) {
-        return cannotAsk(path, "only root can take another account's identity");
+        return cannotAsk(path, "only root can check it for another account");
     }
     if (who.gids.empty()) {
         return cannotAsk(path, "the account has no group");
@@ -54,7 +53,7 @@ Result<Access> folderAccess(const std::string& path, const Identity& who) {
         return answer.error();
     }
     if (*answer == cannotTell) {
-        return cannotAsk(path, "the account's identity cannot be taken");
+        return cannotAsk(path, "the account's rights cannot be taken on");
     }
     return static_cast<Access>(*answer);
 }

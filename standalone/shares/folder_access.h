@@ -9,9 +9,9 @@
 
 namespace velt {
 
-/// Asks the kernel, in a child process that takes this identity, so that modes, access control lists and
-/// read-only mounts all count, on the way to the folder, too. Read: the folder can be reached, listed and
-/// entered; write: files can be made in it as well. Only root can ask for another account. Thread-safe.
+/// Asks the kernel, in a child process with this identity, so that modes, access control lists and read-only
+/// mounts all count, for the folders on the way as well. Read: the folder can be reached, listed and entered.
+/// Write: files can be made in it, too. Only root can ask for another account. Thread-safe.
 Result<Access> folderAccess(const std::string& path, const Identity& who);
 
 } // namespace velt

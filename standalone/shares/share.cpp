@@ -28,11 +28,14 @@ bool isFolderPath(std::string_view path) {
     return (std::string(path) + "/").find("/../") == std::string::npos;
 }
 
-Result<> checkAccounts(const std::map<std::string, Access>& grants, const char* kind) {
+Error wrong(const char* key, const std::string& expected) {
+    return Error(", \"" + std::string(key) + "\": " + expected);
+}
+
+Result<> checkAccounts(const std::map<std::string, Access>& grants, const char* key) {
     for (const auto& [account, grant] : grants) {
         if (account.empty() || account.size() > longestAccount || !isPlainText(account)) {
-            return Error("names a " + std::string(kind) + " that cannot exist: \"" + plainText(account, 80) +
-                         "\"");
+            return wrong(key, "\"" + plainText(account, 80) + "\" cannot be the name of an account");
         }
     }
     return {};
@@ -40,19 +43,18 @@ Result<> checkAccounts(const std::map<std::string, Access>& grants, const char* 
 
 Result<> checkShare(const ShareEntry& share) {
     if (!isShareName(share.name)) {
-        return Error("has a name that is not 1 to 255 bytes of UTF-8 without \"/\" and control characters, "
-                     "or that is \".\" or \"..\"");
+        return wrong("name",
+                     "expected 1 to 255 bytes of UTF-8 in one line, without \"/\", not \".\" or \"..\"");
     }
     if (share.comment.size() > longestComment || !isPlainText(share.comment)) {
-        return Error("has a comment that is not one line of at most 1024 bytes of UTF-8");
+        return wrong("comment", "expected at most 1024 bytes of UTF-8 in one line");
     }
     if (!isFolderPath(share.path)) {
-        return Error("has a path that is not absolute, has \"..\" in it, is longer than 4095 bytes, or is "
-                     "not one line of UTF-8: \"" +
-                     plainText(share.path, 120) + "\"");
+        return wrong("path",
+                     "expected an absolute path without \"..\", at most 4095 bytes of UTF-8 in one line");
     }
-    const Result<> users = checkAccounts(share.users, "user");
-    return users ? checkAccounts(share.groups, "group") : users;
+    const Result<> users = checkAccounts(share.users, "users");
+    return users ? checkAccounts(share.groups, "groups") : users;
 }
 
 } // namespace
@@ -60,13 +62,13 @@ Result<> checkShare(const ShareEntry& share) {
 Result<> checkShares(const std::vector<ShareEntry>& shares) {
     std::set<std::string_view> names;
     for (std::size_t i = 0; i < shares.size(); ++i) {
-        const std::string which =
-            "share " + std::to_string(i + 1) + " (\"" + plainText(shares[i].name, 80) + "\") ";
+        const std::string which = "share " + std::to_string(i + 1);
         if (const Result<> good = checkShare(shares[i]); !good) {
             return Error(ErrorNumber::invalid, which + good.error().message);
         }
         if (!names.insert(shares[i].name).second) {
-            return Error(ErrorNumber::invalid, which + "has the name of another share");
+            return Error(ErrorNumber::invalid,
+                         which + ": duplicate name \"" + plainText(shares[i].name, 80) + "\"");
         }
     }
     return {};

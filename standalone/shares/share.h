@@ -21,7 +21,7 @@ struct ShareEntry {
 };
 
 /// Whether these can be the shares of a server: each as above, and no two of one name. The error's message
-/// names the share, in words that follow a colon.
+/// says which share and what is wrong, as a part of a sentence.
 Result<> checkShares(const std::vector<ShareEntry>& shares);
 
 } // namespace velt

@@ -9,7 +9,7 @@ namespace velt {
 
 namespace {
 
-// The kernel's own number for somebody who owns nothing.
+// The kernel's number for somebody who owns nothing.
 constexpr uid_t stranger = 65534;
 
 std::optional<Access> grantToGroups(const ShareEntry& share, const std::vector<gid_t>& gids) {
@@ -32,7 +32,7 @@ std::optional<Access> grantToUser(const ShareEntry& share, const Identity& user)
     return entry != share.users.end() ? entry->second : grantToGroups(share, user.gids);
 }
 
-/// What remains of the grant where the file system allows this account less.
+/// The grant, or what the file system allows this account where that is less.
 Result<std::optional<Access>> limited(std::optional<Access> grant, const ShareEntry& share,
                                       const Identity& who) {
     if (!grant || *grant == Access::none) {

@@ -11,13 +11,13 @@
 
 namespace velt {
 
-/// What the store grants this user and the file system allows, whichever is less. An entry for the user
-/// decides before those for the groups; of these a refusal counts first, then the right to write. Nothing
-/// when the store says nothing about the user. Thread-safe.
+/// What the store grants this user or the file system allows, whichever is less. An entry for the user comes
+/// before those for groups; among these a refusal comes first, then the right to write. Nothing when the
+/// store says nothing about the user. Thread-safe.
 Result<std::optional<Access>> accessOf(const Identity& user, const ShareEntry& share);
 
-/// The same for the user or, when there is no such user, the group of this name. A group is checked in the
-/// file system as a stranger who belongs to it. Nothing also when there is no such account. Thread-safe.
+/// The same for the user or, when there is no such user, the group of this name. For a group, the file system
+/// is asked about a member who owns nothing. Nothing also when there is no such account. Thread-safe.
 Result<std::optional<Access>> accessOf(const std::string& account, const ShareEntry& share);
 
 } // namespace velt

@@ -23,7 +23,19 @@ constexpr int formVersion = 1;
 constexpr std::array accessWords{"none", "read", "write"};
 
 Error damaged(const std::string& why) {
-    return {ErrorNumber::damaged, statePath(paths::shares).string() + " is damaged: " + why + "."};
+    return {ErrorNumber::damaged, statePath(paths::shares).string() + ": " + why + "."};
+}
+
+/// "* Line 2, Column 3\n  Missing '}'.\n* Line ...": the JSON library's complaints, of which the first one
+/// says all.
+std::string firstOf(const std::string& complaints) {
+    std::string text = complaints.substr(0, complaints.find("\n* "));
+    text.erase(0, text.find_first_not_of("* "));
+    if (const auto newLine = text.find("\n  "); newLine != std::string::npos) {
+        text.replace(newLine, 3, ": ");
+    }
+    text.erase(text.find_last_not_of(".\n") + 1);
+    return text;
 }
 
 Result<Json::Value> parseJson(std::string_view text) {
@@ -39,26 +51,25 @@ Result<Json::Value> parseJson(std::string_view text) {
     } catch (const Json::Exception& tooDeep) {
         errors = tooDeep.what();
     }
-    std::replace(errors.begin(), errors.end(), '\n', ' ');
-    return damaged("no valid JSON: " + plainText(errors, 300));
+    return damaged("invalid JSON: " + plainText(firstOf(errors), 300));
 }
 
 /// Reads the members of a JSON object and keeps the first mistake; what is read after it means nothing.
 class Members {
 public:
     Members(const Json::Value& object, std::string name) : object_(object), name_(std::move(name)) {
-        expect(object.isObject(), "is no object");
+        expect(object.isObject(), ": expected an object");
     }
 
     void expectOnly(std::initializer_list<std::string_view> keys) {
         for (const std::string& key : good() ? object_.getMemberNames() : Json::Value::Members()) {
             expect(std::ranges::find(keys, key) != keys.end(),
-                   "has the unknown key \"" + plainText(key, 80) + "\"");
+                   ": unknown key \"" + plainText(key, 80) + "\"");
         }
     }
     std::string text(const char* key) {
         const Json::Value& value = at(key);
-        expect(value.isString(), "has no text \"" + std::string(key) + "\"");
+        expect(value.isString(), member(key) + "expected a string");
         return good() ? value.asString() : "";
     }
     std::string optionalText(const char* key) { return has(key) ? text(key) : ""; }
@@ -66,14 +77,15 @@ public:
         if (!has(key)) {
             return false;
         }
-        expect(at(key).isBool(), "has \"" + std::string(key) + "\" that is neither true nor false");
+        expect(at(key).isBool(), member(key) + "expected true or false");
         return good() && at(key).asBool();
     }
     std::map<std::string, Access> grants(const char* key);
 
-    Result<> result() const { return good() ? Result<>() : damaged(name_ + " " + mistake_); }
+    Result<> result() const { return good() ? Result<>() : damaged(name_ + mistake_); }
 
 private:
+    static std::string member(const char* key) { return ", \"" + std::string(key) + "\": "; }
     bool good() const { return mistake_.empty(); }
     bool has(const char* key) const { return good() && object_.isMember(key); }
     const Json::Value& at(const char* key) const {
@@ -96,12 +108,12 @@ std::map<std::string, Access> Members::grants(const char* key) {
         return grants;
     }
     const Json::Value& entries = at(key);
-    expect(entries.isObject(), "has \"" + std::string(key) + "\" that is no object");
+    expect(entries.isObject(), member(key) + "expected an object");
     for (const std::string& account : good() ? entries.getMemberNames() : Json::Value::Members()) {
         const Json::Value& value = entries[account];
         const auto* const word = std::ranges::find(accessWords, value.isString() ? value.asString() : "");
-        expect(word != accessWords.end(), "grants \"" + plainText(account, 80) +
-                                              "\" something other than \"none\", \"read\" or \"write\"");
+        expect(word != accessWords.end(), member(key) + "expected \"none\", \"read\" or \"write\" for \"" +
+                                              plainText(account, 80) + "\"");
         grants.emplace(account, static_cast<Access>(word - accessWords.begin()));
     }
     return grants;
@@ -123,17 +135,20 @@ Result<ShareEntry> shareOf(const Json::Value& object, std::size_t number) {
 
 Result<> checkRoot(const Json::Value& root) {
     if (!root.isObject()) {
-        return damaged("the file is no object");
+        return damaged("expected an object");
     }
     if (!root["version"].isInt() || root["version"].asInt() != formVersion) {
-        return damaged("\"version\" is not 1");
+        return damaged("\"version\": expected 1");
     }
     if (!root["shares"].isArray()) {
-        return damaged("\"shares\" is no array");
+        return damaged("\"shares\": expected an array");
     }
-    Members members(root, "the file");
-    members.expectOnly({"version", "shares"});
-    return members.result();
+    for (const std::string& key : root.getMemberNames()) {
+        if (key != "version" && key != "shares") {
+            return damaged("unknown key \"" + plainText(key, 80) + "\"");
+        }
+    }
+    return {};
 }
 
 Json::Value grantsValue(const std::map<std::string, Access>& grants) {

@@ -57,7 +57,7 @@ Result<std::vector<ShareEntry>> loadShares() {
 
 Result<> storeShares(const std::vector<ShareEntry>& shares) {
     if (const Result<> good = checkShares(shares); !good) {
-        return Error(ErrorNumber::invalid, "The shares cannot be stored: " + good.error().message + ".");
+        return Error(ErrorNumber::invalid, "Cannot store the shares: " + good.error().message + ".");
     }
     const auto lock = StateLock::take();
     if (!lock) {

@@ -174,7 +174,7 @@ TEST_F(QuickStart, saysWhenFtpCannotWork) {
     EXPECT_TRUE(contains(run(tree_, startBuilt, withoutMounts), "FTP will not start here: as root "));
     const std::string use =
         run(tree_, ". var/env; veltctl sftp set enable=on; veltctl ftp set enable_ftp=on", withoutMounts);
-    EXPECT_TRUE(contains(use, "mounts of their own are not possible")) << use;
+    EXPECT_TRUE(contains(use, "cannot make a mount namespace")) << use;
     EXPECT_TRUE(contains(use, "enable: off -> on")) << use;
 }
 

@@ -158,7 +158,8 @@ TEST_F(ChrootContract, rulesAreStoredAsTheyStandInTheList) {
     ASSERT_EQ(VELTFTPChrootRuleEnum(list.address()), 0);
     EXPECT_EQ(list.names(), lines);
     EXPECT_LT(VELTFTPChrootRuleSave(List({"g:100:/home", "nonsense"}).get()), 0);
-    EXPECT_EQ(lastErrorSentence(), "Chroot rule 2 cannot be read.");
+    EXPECT_EQ(lastErrorSentence(),
+              "Chroot rule 2: expected a rule like \"u:1000:/share/folder\" or \"g:100:/home\".");
     EXPECT_EQ(loadRules()->size(), 3U);
     ASSERT_EQ(VELTFTPChrootRuleSave(List().get()), 0);
     EXPECT_EQ(loadRules()->size(), 0U);

@@ -58,18 +58,19 @@ TEST_F(RuleStore, isNotMadeAnewWhereItsFileCannotBeReached) {
 
 TEST_F(RuleStore, namesTheLineThatIsDamaged) {
     const std::pair<const char*, const char*> cases[] = {
-        {"", "Line 1 of "},
-        {"velt-chroot-rules 2\n", "Line 1 of "},
-        {"velt-chroot-rules 1", "Line 1 of "},
-        {"velt-chroot-rules 1\nu:1:/home\nnonsense\n", "Line 3 of "},
-        {"velt-chroot-rules 1\nu:1:/home", "Line 2 of "},
-        {"velt-chroot-rules 1\n\n", "Line 2 of "},
+        {"", "line 1: the line is cut off."},
+        {"velt-chroot-rules 2\n", "line 1: expected \"velt-chroot-rules 1\"."},
+        {"velt-chroot-rules 1", "line 1: the line is cut off."},
+        {"velt-chroot-rules 1\nu:1:/home\nnonsense\n",
+         "line 3: expected a rule like \"u:1000:/share/folder\" or \"g:100:/home\"."},
+        {"velt-chroot-rules 1\nu:1:/home", "line 2: the line is cut off."},
+        {"velt-chroot-rules 1\n\n",
+         "line 2: expected a rule like \"u:1000:/share/folder\" or \"g:100:/home\"."},
     };
     for (const auto& [text, sentence] : cases) {
         root_.write("etc/velt/chroot_rules", text);
         const std::string why = messageOf(loadRules());
-        EXPECT_EQ(why.find(sentence), 0U) << text << ": " << why;
-        EXPECT_NE(why.find("chroot_rules"), std::string::npos) << why;
+        EXPECT_EQ(why, (root_.path() / "etc/velt/chroot_rules").string() + ", " + sentence) << text;
     }
 }
 
