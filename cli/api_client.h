@@ -15,10 +15,7 @@ struct ApiMethod {
     std::string method;
 };
 
-inline constexpr const char* ftpApi = "VELT.Core.FileServ.FTP";
-inline constexpr const char* securityApi = "VELT.Core.FileServ.FTP.Security";
 inline constexpr const char* chrootApi = "VELT.Core.FileServ.FTP.ChrootUser";
-inline constexpr const char* sftpApi = "VELT.Core.FileServ.FTP.SFTP";
 
 class ApiClient {
 public:

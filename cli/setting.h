@@ -1,8 +1,9 @@
-// The settings that can be changed one by one: their keys, types and meanings.
+// The settings that can be changed one by one.
 #ifndef VELT_CLI_SETTING_H
 #define VELT_CLI_SETTING_H
 
 #include "cli/api_client.h"
+#include "schema/settings_table.h"
 
 #include <json/value.h>
 
@@ -11,27 +12,15 @@
 
 namespace velt::cli {
 
-enum class SettingType {
-    boolean,
-    integer,
-    text
-};
-
-struct Setting {
-    const char* key = nullptr;
-    SettingType type = SettingType::text;
-    const char* meaning = nullptr;
-    /// The service, as the server's status names it, that this setting switches on and off. Every change must
-    /// name such a setting, changed or not.
-    const char* service = nullptr;
-};
+using schema::Setting;
+using schema::SettingType;
 
 /// The settings behind one "get" and one "set".
 struct SettingGroup {
     const char* command; ///< the first word of the command: ftp, security or sftp
     const char* api;
     int version;
-    std::vector<Setting> settings;
+    std::vector<Setting> settings; ///< those with a key in this version
 
     ApiMethod method(const char* name) const { return {api, version, name}; }
     const Setting* find(const std::string& key) const;
@@ -45,14 +34,17 @@ SettingGroup ftpSettings(int version = newestFtpVersion);
 SettingGroup securitySettings();
 SettingGroup sftpSettings();
 
-/// What values of the type look like, for messages.
-const char* describe(SettingType type);
-
 /// Whether the value has the JSON type of the setting.
 bool hasType(const Json::Value& value, SettingType type);
 
+/// Whether the setting can have the value. A text is checked by the server.
+bool isValid(const Json::Value& value, const Setting& setting);
+
+/// "timeout: expected a number from 0 to 86400".
+std::string expectationOf(const Setting& setting);
+
 /// The object that words of the form key=value name. Throws Failure (usage) for a word of another form, an
-/// unknown key, a key named twice, or a value that is not of the key's type.
+/// unknown key, a key named twice, or a value that the setting cannot have.
 Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::string>& words);
 
 /// The parameters for a "set" that changes what `wanted` names: with the required keys at their current

@@ -5,6 +5,7 @@
 #include "cli/printable.h"
 #include "cli/setting_change.h"
 #include "cli/text_table.h"
+#include "schema/setting_text.h"
 
 #include <CLI/CLI.hpp>
 
@@ -103,7 +104,7 @@ std::string footerOf(const SettingGroup& group) {
     for (const Setting& setting : group.settings) {
         const std::string key = setting.key;
         text += "  " + key + std::string(key.size() < 24 ? 24 - key.size() : 1, ' ') + setting.meaning +
-                " (" + describe(setting.type) + ")\n";
+                " (" + schema::valueFacts(setting, schema::onOff) + ")\n";
     }
     return text;
 }

@@ -65,8 +65,8 @@ void checkSection(const SettingGroup& group, const Json::Value& section, std::ve
         const Setting* setting = group.find(key);
         if (setting == nullptr) {
             faults.push_back(name + ": unknown; known are " + group.keys());
-        } else if (!hasType(section[key], setting->type)) {
-            faults.push_back(name + ": expected " + describe(setting->type));
+        } else if (!isValid(section[key], *setting)) {
+            faults.push_back(group.command + ("." + expectationOf(*setting)));
         }
     }
 }

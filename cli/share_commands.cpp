@@ -1,6 +1,7 @@
 #include "cli/command.h"
 #include "cli/json_io.h"
 #include "cli/text_table.h"
+#include "schema/settings_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -9,7 +10,7 @@ namespace velt::cli {
 namespace {
 
 void listShares(Context& context) {
-    const Json::Value answer = context.api.read({securityApi, 1, "list_ftp_share"});
+    const Json::Value answer = context.api.read({schema::security.api, 1, "list_ftp_share"});
     if (context.wroteJson(answer)) {
         return;
     }

@@ -9,7 +9,7 @@
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "standalone/settings/settings_files.h"
+#include "standalone/settings/settings_store.h"
 
 #include <algorithm>
 #include <climits>

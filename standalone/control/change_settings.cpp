@@ -7,7 +7,6 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/candidate.h"
-#include "standalone/settings/settings_files.h"
 #include "standalone/settings/settings_store.h"
 
 namespace velt {

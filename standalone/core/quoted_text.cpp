@@ -1,34 +1,21 @@
 #include "standalone/core/quoted_text.h"
 
+#include "base/utf8.h"
+
+#include <algorithm>
+
 namespace velt {
 
 namespace {
 
 constexpr std::string_view hexDigits = "0123456789abcdef";
 
-unsigned char byteAt(std::string_view text, std::size_t at) {
-    return at < text.size() ? static_cast<unsigned char>(text[at]) : 0;
-}
-
-bool isContinuation(unsigned char byte) {
-    return (byte & 0xc0) == 0x80;
-}
-
-// The length of the printable UTF-8 sequence of two to four bytes at the front of the text, or 0. Overlong
-// forms, surrogates, what lies above U+10FFFF and the control characters U+0080 to U+009F, which a terminal
-// would obey, are not printable.
-std::size_t printableSequence(std::string_view text) {
-    const unsigned char lead = byteAt(text, 0);
-    const unsigned char second = byteAt(text, 1);
-    if (lead >= 0xc2 && lead <= 0xdf)
-        return isContinuation(second) && !(lead == 0xc2 && second < 0xa0) ? 2 : 0;
-    if (!isContinuation(second) || !isContinuation(byteAt(text, 2)))
-        return 0;
-    if (lead >= 0xe0 && lead <= 0xef)
-        return (lead == 0xe0 && second < 0xa0) || (lead == 0xed && second >= 0xa0) ? 0 : 3;
-    if (lead < 0xf0 || lead > 0xf4 || !isContinuation(byteAt(text, 3)))
-        return 0;
-    return (lead == 0xf0 && second < 0x90) || (lead == 0xf4 && second >= 0x90) ? 0 : 4;
+// The length of the character that the text begins with; 0 for a byte that is not UTF-8, and for a control
+// character, which a terminal would obey.
+std::size_t printableLength(std::string_view text) {
+    const Utf8Character character = firstUtf8Character(text);
+    const bool control = character.code < 0x20 || (character.code >= 0x7f && character.code < 0xa0);
+    return control ? 0 : character.length;
 }
 
 int hexValue(char digit) {
@@ -59,22 +46,17 @@ std::size_t readEscape(std::string_view text, char& byte) {
 std::string quotedText(std::string_view text) {
     std::string quoted = "\"";
     while (!text.empty()) {
-        const unsigned char byte = byteAt(text, 0);
-        std::size_t taken = 1;
-        if (byte == '"' || byte == '\\') {
-            quoted += '\\';
-            quoted += text[0];
-        } else if (byte >= 0x20 && byte < 0x7f) {
-            quoted += text[0];
-        } else if (const auto length = printableSequence(text); length > 0) {
-            taken = length;
-            quoted += text.substr(0, length);
-        } else {
+        const std::size_t length = printableLength(text);
+        if (length == 0) {
+            const auto byte = static_cast<unsigned char>(text[0]);
             quoted += "\\x";
             quoted += hexDigits[byte / 16];
             quoted += hexDigits[byte % 16];
+        } else if (text[0] == '"' || text[0] == '\\') {
+            quoted += '\\';
         }
-        text.remove_prefix(taken);
+        quoted += text.substr(0, length);
+        text.remove_prefix(std::max<std::size_t>(length, 1));
     }
     return quoted + '"';
 }

@@ -1,10 +1,9 @@
 #include "standalone/core/strict_file.h"
 
 #include "base/file.h"
+#include "base/number_text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/quoted_text.h"
-
-#include <charconv>
 
 namespace velt {
 
@@ -33,20 +32,7 @@ std::string_view withoutComment(std::string_view line) {
     return line;
 }
 
-std::optional<std::int64_t> parseNumber(std::string_view text) {
-    std::int64_t number = 0;
-    const char* const textEnd = text.data() + text.size();
-    const auto [end, error] = std::from_chars(text.data(), textEnd, number);
-    return error == std::errc() && end == textEnd ? std::optional(number) : std::nullopt;
-}
-
 } // namespace
-
-std::string numberText(std::int64_t least, std::int64_t most) {
-    if (least == most)
-        return std::to_string(least);
-    return "a number from " + std::to_string(least) + " to " + std::to_string(most);
-}
 
 Result<StrictFile> StrictFile::load(const std::filesystem::path& path, FileVersions versions) {
     const auto contents = readOptionalFile(path);

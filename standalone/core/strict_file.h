@@ -30,9 +30,6 @@ struct FileVersions {
 /// In place of the version in which a key came: the key may be left out of a file of any version.
 inline constexpr int optionalKey = INT_MAX;
 
-/// "a number from 0 to 65535"; "1" where only that is possible.
-std::string numberText(std::int64_t least, std::int64_t most);
-
 /// One file's keys. The functions that read a value give the default, too, when something is wrong; what that
 /// was is the result of finish(), the first problem of several:
 ///

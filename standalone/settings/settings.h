@@ -9,28 +9,30 @@
 
 namespace velt {
 
-/// Everything that the configuration of the FTP daemon follows from.
+/// Everything that the configuration of the FTP daemon follows from. The defaults are those of the tables in
+/// schema/settings_table.h, see defaultFtpSettings.
 struct FtpSettings {
     _tag_VELT_FTP_CONF_ record{};
-    int timeout = 300; ///< seconds; 0: never
-    bool useUtf8 = true;
+    int timeout = 0; ///< seconds; 0: never
+    bool useUtf8 = false;
     bool fipsOnly = false;
     bool ascii = false;
-    bool umask = true;
-    std::string externalAddress; ///< dotted IPv4, or empty
+    bool umask = false;
+    std::string externalAddress{}; ///< dotted IPv4, or empty
 };
 
 /// What the SFTP daemon's configuration follows from.
 struct SftpSettings {
     bool enabled = false;
-    int port = 22;
+    int port = 0;
 };
 
 /// The passive range in force without a custom one.
 inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
 
-/// What is in force before the first store: both services off, port 21, UTF-8 from the start.
+/// What is in force before the first store.
 FtpSettings defaultFtpSettings();
+SftpSettings defaultSftpSettings();
 
 /// Writes the default settings into the files that are not there yet; leaves the others alone, whatever they
 /// hold.

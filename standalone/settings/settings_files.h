@@ -1,27 +1,24 @@
-// The settings files as text. Pure functions: no file is read or written here.
+// The settings files as text. Pure: no file is read or written here.
 #ifndef VELT_STANDALONE_SETTINGS_SETTINGS_FILES_H
 #define VELT_STANDALONE_SETTINGS_SETTINGS_FILES_H
 
 #include "base/result.h"
-#include "standalone/settings/settings.h"
+#include "standalone/core/strict_file.h"
+#include "standalone/settings/settings_fields.h"
 
 #include <string>
-#include <string_view>
 
 namespace velt {
 
-inline constexpr std::string_view externalAddressKey = "ftp_ext_ip";
+/// The settings with every value at its default.
+template<class Settings> Settings defaultSettings(const SettingsFile<Settings>& form);
 
-/// The text of the FTP settings file: every byte of the record, and the settings beside it. The external
-/// address stands in the system information file, not here.
-std::string formatFtpSettings(const FtpSettings& settings);
+/// The text of the settings file: every byte of every field, each below what an administrator wants to know
+/// of it. The external address is not in it, but in the system information file.
+template<class Settings> std::string formatSettings(const SettingsFile<Settings>& form, Settings settings);
 
-/// Reads what formatFtpSettings wrote; errors name the file by `name`, and the line. The external address
-/// stays empty.
-Result<FtpSettings> parseFtpSettings(const std::string& name, std::string_view contents);
-
-std::string formatSftpSettings(const SftpSettings& settings);
-Result<SftpSettings> parseSftpSettings(const std::string& name, std::string_view contents);
+/// Reads what formatSettings wrote in this version or an earlier one. The external address stays empty.
+template<class Settings> Result<Settings> readSettings(const SettingsFile<Settings>& form, StrictFile& file);
 
 } // namespace velt
 

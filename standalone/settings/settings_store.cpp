@@ -12,8 +12,6 @@
 
 #include <unistd.h>
 
-#include <cstring>
-
 namespace velt {
 
 namespace {
@@ -21,15 +19,11 @@ namespace {
 constexpr mode_t settingsMode = 0644;
 
 template<class Settings>
-using Parse = Result<Settings> (*)(const std::string& name, std::string_view contents);
-
-template<class Settings>
-Result<Settings> loadFile(std::string_view name, Parse<Settings> parse, const Settings& defaults) {
-    const auto path = statePath(name);
-    const auto contents = readOptionalFile(path);
-    if (!contents)
-        return contents.error();
-    return *contents ? parse(path.string(), **contents) : defaults;
+Result<Settings> loadFile(std::string_view name, const SettingsFile<Settings>& form) {
+    Result<StrictFile> file = StrictFile::load(statePath(name), {form.version});
+    if (!file)
+        return file.error();
+    return readSettings(form, *file);
 }
 
 Result<> storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
@@ -43,15 +37,8 @@ bool isMissing(std::string_view name) {
 
 } // namespace
 
-FtpSettings defaultFtpSettings() {
-    FtpSettings settings;
-    std::strcpy(settings.record.portnum, "21");
-    settings.record.support_utf8 = 1;
-    return settings;
-}
-
 Result<FtpSettings> loadFtpFile() {
-    return loadFile<FtpSettings>(paths::ftpSettings, parseFtpSettings, defaultFtpSettings());
+    return loadFile(paths::ftpSettings, ftpSettingsFile());
 }
 
 Result<FtpSettings> loadFtpSettings() {
@@ -65,20 +52,20 @@ Result<FtpSettings> loadFtpSettings() {
     settings->externalAddress = address->value_or("");
     if (!settings->externalAddress.empty() && !parseIPv4(settings->externalAddress))
         return Error(ErrorNumber::damaged,
-                     "File " + file.string() + ": the value of ftp_ext_ip is no IPv4 address.");
+                     "Cannot read " + file.string() + ": ftp_ext_ip: expected an IPv4 address.");
     return settings;
 }
 
 Result<SftpSettings> loadSftpSettings() {
-    return loadFile<SftpSettings>(paths::sftpSettings, parseSftpSettings, SftpSettings());
+    return loadFile(paths::sftpSettings, sftpSettingsFile());
 }
 
 Result<> storeFtpSettings(const FtpSettings& settings) {
-    return storeFile("ftp settings", paths::ftpSettings, formatFtpSettings(settings));
+    return storeFile("ftp settings", paths::ftpSettings, formatSettings(ftpSettingsFile(), settings));
 }
 
 Result<> storeSftpSettings(const SftpSettings& settings) {
-    return storeFile("sftp settings", paths::sftpSettings, formatSftpSettings(settings));
+    return storeFile("sftp settings", paths::sftpSettings, formatSettings(sftpSettingsFile(), settings));
 }
 
 Result<> writeMissingSettings() {
@@ -88,7 +75,7 @@ Result<> writeMissingSettings() {
     if (isMissing(paths::ftpSettings))
         if (Result<> stored = storeFtpSettings(defaultFtpSettings()); !stored)
             return stored;
-    return isMissing(paths::sftpSettings) ? storeSftpSettings(SftpSettings()) : Result<>();
+    return isMissing(paths::sftpSettings) ? storeSftpSettings(defaultSftpSettings()) : Result<>();
 }
 
 } // namespace velt

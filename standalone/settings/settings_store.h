@@ -4,7 +4,12 @@
 
 #include "standalone/settings/settings.h"
 
+#include <string_view>
+
 namespace velt {
+
+/// The key of the external address in the system information file, which other programs use as well.
+inline constexpr std::string_view externalAddressKey = "ftp_ext_ip";
 
 /// The FTP settings without the external address, so that a damaged one can be read past and repaired; else
 /// as loadFtpSettings.

@@ -168,8 +168,9 @@ TEST_F(DocumentTest, EveryFaultOfADocumentIsNamedAndNothingIsAsked) {
         "ftp": {"portnum": "21", "port": 1, "enable_ftp": null}, "security": [], "chroot_rules": [{"type": "x"}]})");
     EXPECT_EQ(result.code, 3);
     for (const char* fault :
-         {"format: expected", "smb: unknown", "ftp.portnum: expected a whole number", "ftp.port: unknown",
-          "ftp.enable_ftp: expected on or off", "security: an object", "chroot_rules: rule 1:"}) {
+         {"format: expected", "smb: unknown", "ftp.portnum: expected a number from 1 to 65535",
+          "ftp.port: unknown", "ftp.enable_ftp: expected on or off", "security: an object",
+          "chroot_rules: rule 1:"}) {
         EXPECT_NE(result.err.find(fault), std::string::npos) << fault << "\n" << result.err;
     }
     EXPECT_TRUE(asked().empty());

@@ -7,7 +7,7 @@ TEST_F(SettingsTest, GetShowsATableInAFixedOrder) {
     EXPECT_EQ(result.code, 0);
     EXPECT_EQ(result.out, "SETTING  VALUE  MEANING\n"
                           "enable   off    SFTP runs\n"
-                          "portnum  22     port\n");
+                          "portnum  22     Port of SFTP\n");
     EXPECT_EQ(result.err, "");
 }
 
@@ -27,11 +27,11 @@ TEST_F(SettingsTest, GetWritesTheServersObjectAsJson) {
 }
 
 TEST_F(SettingsTest, OneFtpSettingIsChangedAloneBesideTheRequiredKeys) {
-    const RunResult result = run({"ftp", "set", "timeout=-5"});
+    const RunResult result = run({"ftp", "set", "maxuploadrate=-5"});
     EXPECT_EQ(result.code, 0) << result.err;
-    EXPECT_EQ(result.out, "timeout: 300 -> -5\n");
+    EXPECT_EQ(result.out, "maxuploadrate: 0 -> -5\n");
     ASSERT_EQ(sent(ftpSet).size(), 1U);
-    EXPECT_EQ(sent(ftpSet)[0], jsonOf(R"({"enable_ftp": true, "enable_ftps": false, "timeout": -5})"));
+    EXPECT_EQ(sent(ftpSet)[0], jsonOf(R"({"enable_ftp": true, "enable_ftps": false, "maxuploadrate": -5})"));
     EXPECT_EQ(asked(), (std::vector<std::string>{ftpGet, "GET /api/status", ftpSet, ftpGet}));
 }
 
@@ -185,7 +185,7 @@ TEST_F(SettingsTest, AnUnknownKeyNamesTheKnownOnesAndAsksNothing) {
     const RunResult result = run({"sftp", "set", "port=22"});
     EXPECT_EQ(result.code, 2);
     EXPECT_EQ(result.err,
-              "veltctl: \"port\" is no setting of sftp.\nWhat to do: Known keys: enable, portnum.\n");
+              "veltctl: Unknown sftp setting \"port\".\nWhat to do: Known keys: enable, portnum.\n");
     EXPECT_TRUE(asked().empty());
 }
 
@@ -201,6 +201,31 @@ TEST_F(SettingsTest, AValueOfTheWrongTypeAsksNothing) {
     EXPECT_TRUE(asked().empty());
 }
 
+TEST_F(SettingsTest, ANumberOutOfItsRangeAsksNothing) {
+    EXPECT_EQ(run({"ftp", "set", "timeout=-5"}).err,
+              "veltctl: timeout: expected a number from 0 to 2147483647.\n"
+              "What to do: Run 'veltctl ftp set --help' for all settings.\n");
+    for (const char* word : {"portnum=0", "portnum=65536", "utf8_mode=3", "timeout=2147483648"}) {
+        EXPECT_EQ(run({"ftp", "set", word}).code, 2) << word;
+    }
+    EXPECT_EQ(run({"sftp", "set", "portnum=70000"}).code, 2);
+    EXPECT_TRUE(asked().empty());
+}
+
+TEST_F(SettingsTest, HelpHasTheFactsOfEachSetting) {
+    const std::string help = run({"ftp", "set", "--help"}).out;
+    for (const char* line :
+         {"  timeout                 Idle time after which a session ends; 0 is never (seconds, 0 to "
+          "2147483647, "
+          "default 300)\n",
+          "  portnum                 Port of FTP and FTPS (1 to 65535, default 21)\n",
+          "  enable_fxp              Transfers between two servers are allowed (on or off, default off)\n",
+          "  ext_ip                  External address (an IPv4 address such as 192.0.2.1, default none)\n"}) {
+        EXPECT_NE(help.find(line), std::string::npos) << line << help;
+    }
+    EXPECT_EQ(help.find("use_utf8"), std::string::npos) << help;
+}
+
 TEST_F(SettingsTest, AnAnswerWithoutTheRequiredKeysIsNotBuiltUpon) {
     host.ftp.removeMember("enable_ftps");
     EXPECT_EQ(run({"ftp", "set", "portnum=2121"}).code, 5);
@@ -212,7 +237,7 @@ TEST_F(SettingsTest, ARefusedChangeNamesTheField) {
                     problemReply(422, R"({"title": "A parameter is not valid", "status": 422, "code": 1901,
         "detail": "Wrong UTF-8 webapi parameter", "request_id": "r-7",
         "errors": [{"field": "utf8_mode", "expected": "0, 1 or 2"}]})"));
-    const RunResult result = run({"ftp", "set", "utf8_mode=9"});
+    const RunResult result = run({"ftp", "set", "utf8_mode=0"});
     EXPECT_EQ(result.code, 3);
     EXPECT_EQ(result.out, "");
     EXPECT_EQ(result.err, "veltctl: A parameter is not valid (HTTP 422, code 1901).\n"
@@ -227,7 +252,7 @@ TEST_F(SettingsTest, EachFactOfARefusalIsSaidOnce) {
                     problemReply(422, R"({"title": "A parameter is not valid", "status": 422, "code": 1901,
         "detail": "utf8_mode: expected 0, 1 or 2. Nothing was changed.", "changed": false,
         "errors": [{"field": "utf8_mode", "expected": "0, 1 or 2"}]})"));
-    EXPECT_EQ(run({"ftp", "set", "utf8_mode=9"}).err,
+    EXPECT_EQ(run({"ftp", "set", "utf8_mode=0"}).err,
               "veltctl: A parameter is not valid (HTTP 422, code 1901).\n"
               "  utf8_mode: expected 0, 1 or 2. Nothing was changed.\n"
               "What to do: Correct the input and try again.\n");

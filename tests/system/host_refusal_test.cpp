@@ -127,14 +127,19 @@ TEST_F(HostRefusal, severalWrongFieldsAreAllNamed) {
 
 TEST_F(HostRefusal, aWordThatIsNoValueAsksNothing) {
     for (const Words& words : {Words{"ftp", "set", "portnum=abc"}, Words{"ftp", "set", "enable_fxp=1"},
+                               Words{"ftp", "set", "utf8_mode=9"}, Words{"sftp", "set", "portnum=70000"},
                                Words{"sftp", "set", "port=1"}, Words{"security", "set", "anonymous"}}) {
         expectFailure(words, 2, "veltctl: ");
     }
 }
 
 TEST_F(HostRefusal, aRefusedValueIsExplained) {
-    expectFailure({"ftp", "set", "utf8_mode=9"}, 3, "utf8_mode: expected 0, 1 or 2");
-    expectFailure({"sftp", "set", "portnum=70000"}, 3, "portnum: expected an integer from 1 to 65535");
+    expectFailure({"call", "VELT.Core.FileServ.FTP", "3", "set",
+                   R"({"enable_ftp": true, "enable_ftps": false, "utf8_mode": 9})"},
+                  3, "utf8_mode: expected");
+    expectFailure(
+        {"call", "VELT.Core.FileServ.FTP.SFTP", "1", "set", R"({"enable": true, "portnum": 70000})"}, 3,
+        "portnum: expected an integer from 1 to 65535");
     expectFailure({"call", "VELT.Core.FileServ.FTP", "3", "set", R"({"enable_ftp": "yes"})"}, 3,
                   "enable_ftp: expected true or false");
     expectFailure({"call", "VELT.Core.FileServ.FTP", "4", "set"}, 3, "Nothing is served");
@@ -147,10 +152,12 @@ TEST_F(HostRefusal, aRefusedValueIsExplained) {
 TEST_F(HostRefusal, whatTheServicesCannotTakeIsSaidInTheirWords) {
     done({"ftp", "set", "enable_ftp=on"});
     expectFailure({"ftp", "set", "ext_ip=eth0"}, 5,
-                  "The external address is \"eth0\"; it has to be an IPv4 address");
-    expectFailure({"ftp", "set", "timeout=-5"}, 5, "The FTP time-out is -5 seconds; it has to be 0");
-    expectFailure({"ftp", "set", "timeout=-5"}, 5, "Nothing was changed.");
-    expectFailure({"ftp", "set", "custom_port=30000:30000"}, 5, "a range of two ports or more");
+                  "The external address is \"eth0\"; expected an IPv4 address");
+    const Words negative{"call", "VELT.Core.FileServ.FTP", "3", "set",
+                         R"({"enable_ftp": true, "enable_ftps": false, "timeout": -5})"};
+    expectFailure(negative, 5, "The FTP setting timeout is -5; expected a number from 0 to");
+    expectFailure(negative, 5, "Nothing was changed.");
+    expectFailure({"ftp", "set", "custom_port=30000:30000"}, 5, "two ports or more");
     expectFailure({"security", "set", "anonymous_chroot=on"}, 5, "cannot be empty");
     expectFailure({"chroot", "users", "add", "nobody-like-this"}, 5, "nobody-like-this");
     EXPECT_EQ(fetchHome(), "alice");

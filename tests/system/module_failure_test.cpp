@@ -30,8 +30,7 @@ TEST_F(ModuleFailure, saysWhyARangeIsRefused) {
     expectRefusal(R"({"custom_port_range": true, "custom_port": "30000:70000"})", rangeConflict,
                   "The port 70000 is not one from 1 to 65535.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "30000:30000"})", operationFailed,
-                  "The passive port range holds the port 30000 only; the FTP daemon takes a range of two "
-                  "ports or more.");
+                  "The passive port range has only the port 30000; the FTP daemon needs two ports or more.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "900:910"})", operationFailed,
                   "The passive port range is 900 to 910; both ends have to be from 1024 to 65535.");
     EXPECT_EQ(getFtp()["custom_port_range"], false);
@@ -41,10 +40,10 @@ TEST_F(ModuleFailure, saysWhyAPortIsRefused) {
     ASSERT_EQ(setFtp().code, 0);
     expectRefusal(
         R"({"portnum": 30005, "custom_port_range": true, "custom_port": "30000:30010"})", operationFailed,
-        "The passive port range 30000 to 30010 contains the FTP port 30005; they have to be apart.");
+        "The passive port range 30000 to 30010 contains the FTP port 30005; choose a range without it.");
     expectRefusal(
         R"({"portnum": 55600})", operationFailed,
-        "The passive port range 55536 to 55899 contains the FTP port 55600; they have to be apart.");
+        "The passive port range 55536 to 55899 contains the FTP port 55600; choose a range without it.");
     expectRefusal(R"({"portnum": 0})", portConflict, "The port 0 is not one from 1 to 65535.");
     expectRefusal(R"({"portnum": 22})", portConflict, "Port 22 is taken by the SFTP service.");
     EXPECT_EQ(getFtp()["portnum"], port);
@@ -54,9 +53,9 @@ TEST_F(ModuleFailure, saysWhyAnotherValueIsRefused) {
     ASSERT_EQ(setFtp().code, 0);
     expectRefusal(
         R"({"ext_ip": "eth0"})", operationFailed,
-        "The external address is \"eth0\"; it has to be an IPv4 address such as 192.0.2.1, or empty.");
+        "The external address is \"eth0\"; expected an IPv4 address such as 192.0.2.1, or nothing.");
     expectRefusal(R"({"timeout": -5})", operationFailed,
-                  "The FTP time-out is -5 seconds; it has to be 0 (never) or more.");
+                  "The FTP setting timeout is -5; expected a number from 0 to 2147483647.");
     EXPECT_EQ(getFtp()["ext_ip"], "");
 }
 

@@ -95,7 +95,7 @@ TEST_F(FtpContract, ARefusedRecordLeavesTheStoredOne) {
     EXPECT_LT(VELTFTPConfSet(conf), 0);
     EXPECT_EQ(VLIBCErrGet(), 0x0100);
     EXPECT_LT(VELTFTPTimeOutSet(-1), 0);
-    EXPECT_EQ(lastErrorSentence(), "The FTP time-out is -1 seconds; it has to be 0 (never) or more.");
+    EXPECT_EQ(lastErrorSentence(), "The FTP setting timeout is -1; expected a number from 0 to 2147483647.");
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), before);
     EXPECT_EQ(test::fakeCandidate().ftp.size(), 1U) << "the daemon is not asked about what is refused here";
 }
@@ -220,8 +220,8 @@ TEST_F(FtpContract, ADamagedFileFailsEveryOperationAndIsNotOverwritten) {
     _tag_VELT_FTP_CONF_ conf{};
     EXPECT_LT(VELTFTPConfGet(&conf), 0);
     EXPECT_EQ(VLIBCErrGet(), 0x0301);
-    EXPECT_EQ(lastErrorSentence(), "Cannot read " + place("/etc/velt/ftp.conf") +
-                                       ", line 2: port: expected a text in double quotes.");
+    EXPECT_EQ(lastErrorSentence(),
+              "Cannot read " + place("/etc/velt/ftp.conf") + ": missing key \"service_flags\".");
     EXPECT_LT(VELTFTPTimeOutGet(), 0);
     EXPECT_LT(VELTFTPUseUTF8Get(), 0);
     EXPECT_LT(VELTFTPFIPSEnabledGet(), 0);

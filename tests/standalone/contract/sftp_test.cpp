@@ -30,7 +30,7 @@ TEST_F(SftpContract, StoresFlagAndPort) {
 TEST_F(SftpContract, RefusesWhatSshdWouldRefuse) {
     for (const int port : {-1, 0, 65536})
         EXPECT_LT(VELTSFTPConfigSet(1, port), 0);
-    EXPECT_EQ(lastErrorSentence(), "The SFTP port is 65536; it has to be from 1 to 65535.");
+    EXPECT_EQ(lastErrorSentence(), "The SFTP setting portnum is 65536; expected a number from 1 to 65535.");
     test::fakeCandidate().refuses = true;
     EXPECT_LT(VELTSFTPConfigSet(1, 22), 0);
     EXPECT_EQ(lastErrorSentence(), "The daemon does not take it.");
@@ -61,7 +61,7 @@ TEST_F(SftpContract, ADamagedFileIsNamedAndKept) {
     _tag_VELT_SFTP_CONFIG_ conf{};
     EXPECT_LT(VELTSFTPConfigGet(1, &conf), 0);
     EXPECT_EQ(lastErrorSentence(), "Cannot read " + place("/etc/velt/sftp.conf") +
-                                       ", line 3: port: expected a number from -2147483648 to 2147483647.");
+                                       ", line 3: port: expected a number from 1 to 65535.");
     EXPECT_LT(VELTSFTPConfigSet(1, 22), 0);
     EXPECT_EQ(root_.read("etc/velt/sftp.conf"), "version = 1\nenabled = 1\nport = 22a\n");
 }

@@ -46,20 +46,20 @@ TEST(CheckFtp, ThePortIsADecimalNumberFrom1To65535) {
     for (const char* text :
          {"", "0", "65536", "-1", "+21", " 21", "21 ", "021", "2121abc", "0x15", "9999999", "21\n", "2.1"}) {
         const std::string problem = problemAfter(port(text));
-        EXPECT_EQ(problem.substr(0, 16), "The FTP port is ") << text;
+        EXPECT_EQ(problem.substr(0, 27), "The FTP setting portnum is ") << text;
     }
     EXPECT_EQ(problemAfter(port("70000")),
-              "The FTP port is \"70000\"; it has to be a decimal number from 1 to 65535.");
+              "The FTP setting portnum is \"70000\"; expected a number from 1 to 65535.");
     EXPECT_EQ(problemAfter(port("21\nX")),
-              "The FTP port is \"21\\x0aX\"; it has to be a decimal number from 1 to 65535.");
+              "The FTP setting portnum is \"21\\x0aX\"; expected a number from 1 to 65535.");
 }
 
 TEST(CheckFtp, TextsEndWithinTheirFields) {
-    EXPECT_EQ(problemAfter(port("00000021")), "The FTP port does not end within its 8 bytes.");
+    EXPECT_EQ(problemAfter(port("00000021")), "The FTP setting portnum does not end within its 8 bytes.");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) {
                   std::memset(settings.record.anonymous_chroot_share, 'x', 492);
               }),
-              "The name of the anonymous share does not end within its 492 bytes.");
+              "The FTP setting anonymous_chroot_share does not end within its 492 bytes.");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) {
                   std::memset(settings.record.anonymous_chroot_share, 'x', 491);
               }),
@@ -77,14 +77,14 @@ TEST(CheckFtp, ThePassiveRangeGoesUpwardsFrom1024To65535) {
               "The passive port range is -5 to 2147483647; both ends have to be from 1024 to 65535.");
     EXPECT_EQ(problemAfter(range(50001, 50000)),
               "The passive port range is 50001 to 50000; its first port has to be lower than its last.");
-    EXPECT_EQ(problemAfter(range(50000, 50000)), "The passive port range holds the port 50000 only; the FTP "
-                                                 "daemon takes a range of two ports or more.");
+    EXPECT_EQ(problemAfter(range(50000, 50000)), "The passive port range has only the port 50000; the FTP "
+                                                 "daemon needs two ports or more.");
 }
 
 TEST(CheckFtp, ARangeWithAnEndOfZeroIsNone) {
     EXPECT_EQ(problemAfter(range(0, 99999)), "");
     EXPECT_EQ(problemAfter(range(-1, 0)), "");
-    FtpSettings settings;
+    FtpSettings settings = defaultFtpSettings();
     range(0, 99999)(settings);
     EXPECT_FALSE(hasCustomPassiveRange(settings.record));
     EXPECT_EQ(passiveRange(settings.record).first, 55536);
@@ -98,10 +98,10 @@ TEST(CheckFtp, TheRangeInForceIsApartFromThePort) {
                       range(2000, 2100)(settings);
                   }),
                   std::string("The passive port range 2000 to 2100 contains the FTP port ") + text +
-                      "; they have to be apart.");
+                      "; choose a range without it.");
     EXPECT_EQ(problemAfter(port("55600")),
               "The passive port range 55536 to 55899 contains the FTP port 55600; "
-              "they have to be apart.");
+              "choose a range without it.");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) {
                   port("55600")(settings);
                   range(2000, 2100)(settings);
@@ -113,7 +113,7 @@ TEST(CheckFtp, TheTimeOutIsNotNegative) {
     for (const int seconds : {0, 1, INT_MAX})
         EXPECT_EQ(problemAfter([&](FtpSettings& settings) { settings.timeout = seconds; }), "");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) { settings.timeout = -5; }),
-              "The FTP time-out is -5 seconds; it has to be 0 (never) or more.");
+              "The FTP setting timeout is -5; expected a number from 0 to 2147483647.");
 }
 
 TEST(CheckFtp, LimitsBelowOneMeanNoLimit) {
@@ -134,7 +134,7 @@ TEST(CheckFtp, TheExternalAddressIsIPv4OrEmpty) {
                              "example.org", "1.2.3.4\nPort 1", "%{env:HOME}", "0x7f.1.1.1"})
         EXPECT_EQ(problemAfter(address(text)).substr(0, 24), "The external address is ") << text;
     EXPECT_EQ(problemAfter(address("eth0")),
-              "The external address is \"eth0\"; it has to be an IPv4 address such as 192.0.2.1, or empty.");
+              "The external address is \"eth0\"; expected an IPv4 address such as 192.0.2.1, or nothing.");
     EXPECT_NE(problemAfter(address(std::string("1.2.3.4\0x", 9))), "");
 }
 
@@ -144,8 +144,8 @@ TEST(CheckSftp, ThePortIsFrom1To65535) {
     for (const int number : {INT_MIN, -1, 0, 65536, INT_MAX}) {
         const Result<> checked = checkSftpSettings({true, number});
         ASSERT_FALSE(checked);
-        EXPECT_EQ(checked.error().message,
-                  "The SFTP port is " + std::to_string(number) + "; it has to be from 1 to 65535.");
+        EXPECT_EQ(checked.error().message, "The SFTP setting portnum is " + std::to_string(number) +
+                                               "; expected a number from 1 to 65535.");
     }
 }
 

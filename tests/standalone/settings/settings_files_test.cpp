@@ -9,60 +9,72 @@ namespace velt {
 namespace {
 
 constexpr const char* goldenFtp =
-    R"(# FTP and FTPS settings of this server. The file is written anew whenever the administration changes a
+    R"(# FTP settings of this server. The file is written anew whenever the administration changes a
 # setting; a change made here by hand takes effect when the service is started the next time.
 version = 1
 
-# The control port.
-port = "21"
-
-# Services that are on: 1 FTP, 2 FTPS, 3 both.
+# Services that run: 1 is FTP, 2 is FTPS, 3 is both (any number, default 0).
 service_flags = 0
 
-# Ports for passive transfers; 0 and 0: the default range, 55536 to 55899.
-passive_port_min = 0
-passive_port_max = 0
-
-# Passive mode announces the address ftp_ext_ip of veltinfo.conf.
-use_ext_ip = 0
-
-# Limits for each session, in KB/s of 1024 bytes; 0: no limit. In force while enable_flow_ctrl is 1.
-enable_flow_ctrl = 0
-maxuploadrate = 0
-maxdownloadrate = 0
-
-# Connections from one address; 0: no limit.
-max_conn_per_ip = 0
-
-# Transfers from server to server.
-enable_fxp = 0
-
-# File names in UTF-8: support_utf8 offers it, use_utf8 uses it from the start.
-support_utf8 = 1
-use_utf8 = 1
-
-# FIPS-approved algorithms only.
-fips = 0
-
-# ASCII transfers convert line ends.
-ascii = 0
-
-# Uploads get the server's umask.
-umask = 1
-
-# An idle session ends after so many seconds; 0: never.
+# Idle time after which a session ends; 0 is never (seconds, 0 to 2147483647, default 300).
 timeout = 300
 
-# Anonymous login, and the share that it is confined to.
-anonymous = 0
-anonymous_chroot = 0
-anonymous_chroot_share = ""
+# Port of FTP and FTPS (1 to 65535, default 21).
+port = "21"
 
-# Users are confined to their home folders.
+# First port for passive transfers; 0 is the default range, 55536 to 55899 (0 to 65535, default 0).
+passive_port_min = 0
+
+# Last port for passive transfers; 0 is the default range (0 to 65535, default 0).
+passive_port_max = 0
+
+# Passive mode announces the external address (0 or 1, default 0).
+use_ext_ip = 0
+
+# File names may be in UTF-8 (0 or 1, default 1).
+support_utf8 = 1
+
+# File names are in UTF-8 from the start (0 or 1, default 1).
+use_utf8 = 1
+
+# Transfers between two servers are allowed (0 or 1, default 0).
+enable_fxp = 0
+
+# ASCII transfers convert line ends (0 or 1, default 0).
+ascii = 0
+
+# Only algorithms approved by FIPS are used (0 or 1, default 0).
+fips = 0
+
+# The limits maxuploadrate and maxdownloadrate are in force (0 or 1, default 0).
+enable_flow_ctrl = 0
+
+# Upload limit of a session; 0 is none (KB/s of 1024 bytes, 0 to 2147483647, default 0).
+maxuploadrate = 0
+
+# Download limit of a session; 0 is none (KB/s of 1024 bytes, 0 to 2147483647, default 0).
+maxdownloadrate = 0
+
+# Connections from one client address; 0 is any number (0 to 2147483647, default 0).
+max_conn_per_ip = 0
+
+# Kept unchanged for other programs (any number, default 0).
+reserved = 0
+
+# Users are confined to their home folders (0 or 1, default 0).
 user_chroot = 0
 
-# Kept for programs that use it.
-reserved = 0
+# Anonymous login is allowed (0 or 1, default 0).
+anonymous = 0
+
+# Anonymous users are confined to one share (0 or 1, default 0).
+anonymous_chroot = 0
+
+# Share that anonymous users are confined to (the name of a share, default none).
+anonymous_chroot_share = ""
+
+# The server's umask applies to uploads (0 or 1, default 1).
+umask = 1
 )";
 
 constexpr const char* goldenSftp =
@@ -70,12 +82,27 @@ constexpr const char* goldenSftp =
 # setting; a change made here by hand takes effect when the service is started the next time.
 version = 1
 
-# The service is on.
+# SFTP runs (0 or 1, default 0).
 enabled = 0
 
-# Its port.
+# Port of SFTP (1 to 65535, default 22).
 port = 22
 )";
+
+std::string format(const FtpSettings& settings) {
+    return formatSettings(ftpSettingsFile(), settings);
+}
+
+template<class Settings> Result<Settings> parse(const SettingsFile<Settings>& form, const std::string& text) {
+    Result<StrictFile> file = StrictFile::parse("x.conf", text, {form.version});
+    if (!file)
+        return file.error();
+    return readSettings(form, *file);
+}
+
+Result<FtpSettings> parse(const std::string& text) {
+    return parse(ftpSettingsFile(), text);
+}
 
 std::string replaced(std::string text, const std::string& from, const std::string& to) {
     const auto at = text.find(from);
@@ -84,7 +111,7 @@ std::string replaced(std::string text, const std::string& from, const std::strin
 }
 
 std::string problemOf(const std::string& text) {
-    const auto settings = parseFtpSettings("ftp.conf", text);
+    const auto settings = parse(text);
     return settings ? "" : settings.error().message;
 }
 
@@ -93,8 +120,8 @@ bool isSameRecord(const _tag_VELT_FTP_CONF_& a, const _tag_VELT_FTP_CONF_& b) {
 }
 
 TEST(SettingsFiles, TheDefaultsAsText) {
-    EXPECT_EQ(formatFtpSettings(defaultFtpSettings()), goldenFtp);
-    EXPECT_EQ(formatSftpSettings({}), goldenSftp);
+    EXPECT_EQ(format(defaultFtpSettings()), goldenFtp);
+    EXPECT_EQ(formatSettings(sftpSettingsFile(), defaultSftpSettings()), goldenSftp);
 }
 
 TEST(SettingsFiles, ValuesAsText) {
@@ -103,7 +130,7 @@ TEST(SettingsFiles, ValuesAsText) {
     settings.record.service_flags = -2147483647 - 1;
     settings.record.reserved = 2147483647;
     settings.useUtf8 = false;
-    const std::string text = formatFtpSettings(settings);
+    const std::string text = format(settings);
 
     EXPECT_NE(text.find("\nanonymous_chroot_share = \"Bücher \\\"alt\\\"\\x0aport = 1\"\n"),
               std::string::npos);
@@ -115,10 +142,10 @@ TEST(SettingsFiles, ValuesAsText) {
 TEST(SettingsFiles, BytesBehindTheEndOfATextAreKept) {
     FtpSettings settings = defaultFtpSettings();
     std::memcpy(settings.record.portnum, "21\0001\0\0\0", 8);
-    const std::string text = formatFtpSettings(settings);
+    const std::string text = format(settings);
 
     EXPECT_NE(text.find("\nport = \"21\\x001\"\n"), std::string::npos);
-    const auto read = parseFtpSettings("ftp.conf", text);
+    const auto read = parse(text);
     ASSERT_TRUE(read) << read.error().message;
     EXPECT_TRUE(isSameRecord(read->record, settings.record));
 }
@@ -138,7 +165,7 @@ TEST(SettingsFiles, ARecordOfAnyBytesComesBackTheSame) {
         settings.ascii = i % 5 == 0;
         settings.umask = i % 7 == 0;
 
-        const auto read = parseFtpSettings("ftp.conf", formatFtpSettings(settings));
+        const auto read = parse(format(settings));
         ASSERT_TRUE(read) << read.error().message;
         ASSERT_TRUE(isSameRecord(read->record, settings.record));
         EXPECT_EQ(read->timeout, settings.timeout);
@@ -150,8 +177,7 @@ TEST(SettingsFiles, ARecordOfAnyBytesComesBackTheSame) {
 }
 
 TEST(SettingsFiles, AHandWrittenFileMayBeSpacedAndOrderedOtherwise) {
-    const auto read =
-        parseSftpSettings("sftp.conf", "port=2022\r\n\t# mine\r\n   enabled\t =  1 \r\nversion=1");
+    const auto read = parse(sftpSettingsFile(), "port=2022\r\n\t# mine\r\n   enabled\t =  1 \r\nversion=1");
     ASSERT_TRUE(read) << read.error().message;
     EXPECT_TRUE(read->enabled);
     EXPECT_EQ(read->port, 2022);
@@ -167,7 +193,7 @@ TEST(SettingsFiles, EveryMissingKeyIsNamed) {
             continue;
         const std::string key = line.substr(0, line.find(' '));
         EXPECT_EQ(problemOf(replaced(golden, "\n" + line + "\n", "\n")),
-                  "Cannot read ftp.conf: missing key \"" + key + "\".");
+                  "Cannot read x.conf: missing key \"" + key + "\".");
         ++keys;
     }
     EXPECT_EQ(keys, 22);
@@ -179,41 +205,38 @@ TEST(SettingsFiles, DamageIsNamedByFileAndLine) {
         const char* to;
         const char* problem;
     } cases[] = {
-        {"timeout = 300", "timeout = 3oo",
-         "line 43: timeout: expected a number from -2147483648 to 2147483647"},
-        {"timeout = 300", "timeout =", "line 43: timeout: expected a number from -2147483648 to 2147483647"},
-        {"timeout = 300", "timeout = 2147483648",
-         "line 43: timeout: expected a number from -2147483648 to 2147483647"},
-        {"timeout = 300", "timeout = +1",
-         "line 43: timeout: expected a number from -2147483648 to 2147483647"},
-        {"timeout = 300", "timeout 300", "line 43: expected \"key = value\""},
-        {"timeout = 300", "= 300", "line 43: expected \"key = value\""},
-        {"timeout = 300", "timeout = 300\ntime_out = 3", "line 44: unknown key \"time_out\""},
-        {"timeout = 300", "timeout = 300\ntimeout = 3", "line 44: duplicate key \"timeout\""},
-        {"umask = 1", "umask = yes", "line 40: umask: expected 0 or 1"},
-        {"umask = 1", "umask = 2", "line 40: umask: expected 0 or 1"},
-        {"port = \"21\"", "port = 21", "line 6: port: expected a text in double quotes"},
-        {"port = \"21\"", "port = \"123456789\"", "line 6: port: expected at most 8 bytes"},
+        {"timeout = 300", "timeout = 3oo", "line 9: timeout: expected a number from 0 to 2147483647"},
+        {"timeout = 300", "timeout =", "line 9: timeout: expected a number from 0 to 2147483647"},
+        {"timeout = 300", "timeout = 2147483648", "line 9: timeout: expected a number from 0 to 2147483647"},
+        {"timeout = 300", "timeout = +1", "line 9: timeout: expected a number from 0 to 2147483647"},
+        {"timeout = 300", "timeout 300", "line 9: expected \"key = value\""},
+        {"timeout = 300", "= 300", "line 9: expected \"key = value\""},
+        {"timeout = 300", "timeout = 300\ntime_out = 3", "line 10: unknown key \"time_out\""},
+        {"timeout = 300", "timeout = 300\ntimeout = 3", "line 10: duplicate key \"timeout\""},
+        {"umask = 1", "umask = yes", "line 66: umask: expected 0 or 1"},
+        {"umask = 1", "umask = 2", "line 66: umask: expected 0 or 1"},
+        {"port = \"21\"", "port = 21", "line 12: port: expected a text in double quotes"},
+        {"port = \"21\"", "port = \"123456789\"", "line 12: port: expected at most 8 bytes"},
         {"version = 1", "version = 2",
          "line 3: version 2 is newer than this program, which knows files up to version 1"},
         {"version = 1", "version = 0", "line 3: version: expected 1"},
     };
     for (const auto& one : cases)
         EXPECT_EQ(problemOf(replaced(goldenFtp, one.from, one.to)),
-                  std::string("Cannot read ftp.conf, ") + one.problem + ".");
+                  std::string("Cannot read x.conf, ") + one.problem + ".");
 }
 
 TEST(SettingsFiles, AnEmptyOrOverwrittenFileIsDamaged) {
-    EXPECT_EQ(problemOf(""), "Cannot read ftp.conf: missing key \"version\".");
-    EXPECT_EQ(problemOf(std::string(4096, '\0')), "Cannot read ftp.conf, line 1: expected \"key = value\".");
+    EXPECT_EQ(problemOf(""), "Cannot read x.conf: missing key \"version\".");
+    EXPECT_EQ(problemOf(std::string(4096, '\0')), "Cannot read x.conf, line 1: expected \"key = value\".");
     EXPECT_EQ(problemOf("\x7f"
                         "ELF\x02\x01"),
-              "Cannot read ftp.conf, line 1: expected \"key = value\".");
+              "Cannot read x.conf, line 1: expected \"key = value\".");
 }
 
 TEST(SettingsFiles, ANewerVersionIsRefusedWhateverElseItHolds) {
     EXPECT_EQ(problemOf("version = 7\nport = 21\nsomething_new = {}\n"),
-              "Cannot read ftp.conf, line 1: version 7 is newer than this program, which knows files up to "
+              "Cannot read x.conf, line 1: version 7 is newer than this program, which knows files up to "
               "version 1.");
 }
 
@@ -221,7 +244,7 @@ TEST(SettingsFiles, EveryTruncationIsRefused) {
     const std::string golden = goldenFtp;
     // Without the last line end the last value is still whole.
     for (std::size_t length = 0; length < golden.size() - 1; ++length)
-        ASSERT_FALSE(parseFtpSettings("ftp.conf", golden.substr(0, length))) << length;
+        ASSERT_FALSE(parse(golden.substr(0, length))) << length;
 }
 
 } // namespace

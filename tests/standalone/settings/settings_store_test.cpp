@@ -13,8 +13,8 @@ class SettingsStore : public test::SettingsTest {};
 
 TEST_F(SettingsStore, TheFirstOpeningWritesTheDefaults) {
     ASSERT_EQ(openState(root_.path()), 0) << lastErrorSentence();
-    EXPECT_EQ(root_.read("etc/velt/ftp.conf"), formatFtpSettings(defaultFtpSettings()));
-    EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSftpSettings({}));
+    EXPECT_EQ(root_.read("etc/velt/ftp.conf"), formatSettings(ftpSettingsFile(), defaultFtpSettings()));
+    EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSettings(sftpSettingsFile(), defaultSftpSettings()));
     struct stat status {};
     ASSERT_EQ(::stat(place("/etc/velt/ftp.conf").c_str(), &status), 0);
     EXPECT_EQ(status.st_mode & 0777, 0644U);
@@ -24,7 +24,7 @@ TEST_F(SettingsStore, ALaterOpeningLeavesWhatIsThere) {
     root_.write("etc/velt/ftp.conf", "damaged");
     ASSERT_EQ(openState(root_.path()), 0);
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), "damaged");
-    EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSftpSettings({}));
+    EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSettings(sftpSettingsFile(), defaultSftpSettings()));
 }
 
 TEST_F(SettingsStore, AnOpeningThatCannotWriteSaysWhy) {
@@ -44,7 +44,7 @@ TEST_F(SettingsStore, ADamagedExternalAddressIsAnErrorThatCanBeRepaired) {
     const auto settings = loadFtpSettings();
     ASSERT_FALSE(settings);
     EXPECT_EQ(settings.error().message,
-              "File " + place("/etc/veltinfo.conf") + ": the value of ftp_ext_ip is no IPv4 address.");
+              "Cannot read " + place("/etc/veltinfo.conf") + ": ftp_ext_ip: expected an IPv4 address.");
     ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
     EXPECT_EQ(loadFtpSettings()->externalAddress, "203.0.113.7");
 }
@@ -57,7 +57,7 @@ TEST_F(SettingsStore, AnUnreadableFileIsNoMissingFile) {
 }
 
 TEST_F(SettingsStore, AHandEditedValueThatNoDaemonTakesIsRepairedByStoringAGoodOne) {
-    std::string text = formatFtpSettings(defaultFtpSettings());
+    std::string text = formatSettings(ftpSettingsFile(), defaultFtpSettings());
     text.replace(text.find("timeout = 300"), 13, "timeout = -30");
     root_.write("etc/velt/ftp.conf", text);
     EXPECT_EQ(VELTFTPTimeOutGet(), -30);

@@ -9,10 +9,8 @@
 namespace velt::test {
 
 inline FtpSettings plainSettings() {
-    FtpSettings settings;
-    std::strcpy(settings.record.portnum, "21");
+    FtpSettings settings = defaultFtpSettings();
     settings.record.service_flags = VELT_FTP_SERVICE_PLAIN;
-    settings.record.support_utf8 = 1;
     settings.record.user_chroot = 1;
     settings.ascii = true;
     return settings;

@@ -1,0 +1,168 @@
+// The settings of the services: every fact about each, once. The settings files, the command line and the
+// checks follow from these tables; the description of the API says the same, which a test holds.
+#ifndef VELT_SCHEMA_SETTINGS_TABLE_H
+#define VELT_SCHEMA_SETTINGS_TABLE_H
+
+#include <cstdint>
+#include <span>
+
+namespace velt::schema {
+
+enum class SettingType {
+    boolean,
+    number,
+    text,
+};
+
+inline constexpr std::int64_t highestPort = 65535;
+inline constexpr std::int64_t highestNumber = INT32_MAX;
+inline constexpr std::int64_t lowestNumber = INT32_MIN;
+
+/// One setting, as the API and the command line show it, as its file stores it, or both.
+struct Setting {
+    const char* key = nullptr;     ///< in the API and on the command line; null: not served
+    const char* fileKey = nullptr; ///< in the settings file; null: not stored there, or under other keys
+    SettingType type = SettingType::boolean;
+    const char* meaning = "";   ///< a sentence without a full stop
+    const char* unit = nullptr; ///< of a number
+    std::int64_t least = 0;     ///< of a number
+    std::int64_t most = highestNumber;
+    bool lenient = false;          ///< numbers out of the range are stored, too, and have no effect
+    std::int64_t number = 0;       ///< the default of a number; of a boolean 0 or 1
+    const char* text = "";         ///< the default of a text
+    const char* form = "a text";   ///< what a text looks like
+    int since = 1;                 ///< the version of the settings file in which the key came
+    int apiVersion = 0;            ///< the only version of the API that has the key; 0: each has it
+    const char* service = nullptr; ///< the service that a boolean switches on and off
+};
+
+inline constexpr Setting ftpSettings[] = {
+    {.key = "enable_ftp", .meaning = "Plain FTP runs", .service = "ftp"},
+    {.key = "enable_ftps", .meaning = "FTP over TLS runs", .service = "ftps"},
+    {.fileKey = "service_flags",
+     .type = SettingType::number,
+     .meaning = "Services that run: 1 is FTP, 2 is FTPS, 3 is both",
+     .least = lowestNumber},
+    {.key = "timeout",
+     .fileKey = "timeout",
+     .type = SettingType::number,
+     .meaning = "Idle time after which a session ends; 0 is never",
+     .unit = "seconds",
+     .number = 300},
+    {.key = "portnum",
+     .fileKey = "port",
+     .type = SettingType::number,
+     .meaning = "Port of FTP and FTPS",
+     .least = 1,
+     .most = highestPort,
+     .number = 21},
+    {.key = "custom_port_range", .meaning = "Passive transfers use custom_port, not the default range"},
+    {.key = "custom_port",
+     .type = SettingType::text,
+     .meaning = "Ports for passive transfers",
+     .text = "55536:55899",
+     .form = "first and last port, such as 55536:55899"},
+    {.fileKey = "passive_port_min",
+     .type = SettingType::number,
+     .meaning = "First port for passive transfers; 0 is the default range, 55536 to 55899",
+     .most = highestPort,
+     .lenient = true},
+    {.fileKey = "passive_port_max",
+     .type = SettingType::number,
+     .meaning = "Last port for passive transfers; 0 is the default range",
+     .most = highestPort,
+     .lenient = true},
+    {.key = "use_ext_ip", .fileKey = "use_ext_ip", .meaning = "Passive mode announces the external address"},
+    {.key = "ext_ip",
+     .type = SettingType::text,
+     .meaning = "External address",
+     .form = "an IPv4 address such as 192.0.2.1"},
+    {.key = "enable_utf8",
+     .fileKey = "support_utf8",
+     .meaning = "File names may be in UTF-8",
+     .number = 1,
+     .apiVersion = 1},
+    {.key = "use_utf8",
+     .fileKey = "use_utf8",
+     .meaning = "File names are in UTF-8 from the start",
+     .number = 1,
+     .apiVersion = 2},
+    {.key = "utf8_mode",
+     .type = SettingType::number,
+     .meaning = "File names in UTF-8: 0 is never, 1 is when the client asks, 2 is from the start",
+     .most = 2,
+     .number = 2,
+     .apiVersion = 3},
+    {.key = "enable_fxp", .fileKey = "enable_fxp", .meaning = "Transfers between two servers are allowed"},
+    {.key = "enable_ascii", .fileKey = "ascii", .meaning = "ASCII transfers convert line ends"},
+    {.key = "enable_fips", .fileKey = "fips", .meaning = "Only algorithms approved by FIPS are used"},
+    {.key = "enable_flow_ctrl",
+     .fileKey = "enable_flow_ctrl",
+     .meaning = "The limits maxuploadrate and maxdownloadrate are in force"},
+    {.key = "maxuploadrate",
+     .fileKey = "maxuploadrate",
+     .type = SettingType::number,
+     .meaning = "Upload limit of a session; 0 is none",
+     .unit = "KB/s of 1024 bytes",
+     .lenient = true},
+    {.key = "maxdownloadrate",
+     .fileKey = "maxdownloadrate",
+     .type = SettingType::number,
+     .meaning = "Download limit of a session; 0 is none",
+     .unit = "KB/s of 1024 bytes",
+     .lenient = true},
+    {.key = "max_conn_per_ip",
+     .fileKey = "max_conn_per_ip",
+     .type = SettingType::number,
+     .meaning = "Connections from one client address; 0 is any number",
+     .lenient = true},
+    {.fileKey = "reserved",
+     .type = SettingType::number,
+     .meaning = "Kept unchanged for other programs",
+     .least = lowestNumber},
+};
+
+inline constexpr Setting securitySettings[] = {
+    {.key = "user_chroot", .fileKey = "user_chroot", .meaning = "Users are confined to their home folders"},
+    {.key = "anonymous", .fileKey = "anonymous", .meaning = "Anonymous login is allowed"},
+    {.key = "anonymous_chroot",
+     .fileKey = "anonymous_chroot",
+     .meaning = "Anonymous users are confined to one share"},
+    {.key = "anonymous_chroot_share",
+     .fileKey = "anonymous_chroot_share",
+     .type = SettingType::text,
+     .meaning = "Share that anonymous users are confined to",
+     .form = "the name of a share"},
+    {.key = "enable_umask",
+     .fileKey = "umask",
+     .meaning = "The server's umask applies to uploads",
+     .number = 1},
+};
+
+inline constexpr Setting sftpSettings[] = {
+    {.key = "enable", .fileKey = "enabled", .meaning = "SFTP runs", .service = "sftp"},
+    {.key = "portnum",
+     .fileKey = "port",
+     .type = SettingType::number,
+     .meaning = "Port of SFTP",
+     .least = 1,
+     .most = highestPort,
+     .number = 22},
+};
+
+/// The settings behind one API.
+struct SettingGroup {
+    const char* name; ///< on the command line
+    const char* api;
+    int newestApiVersion;
+    std::span<const Setting> settings;
+};
+
+inline constexpr SettingGroup ftp{"ftp", "VELT.Core.FileServ.FTP", 3, ftpSettings};
+inline constexpr SettingGroup security{"security", "VELT.Core.FileServ.FTP.Security", 1,
+                                       securitySettings};
+inline constexpr SettingGroup sftp{"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, sftpSettings};
+
+} // namespace velt::schema
+
+#endif
