@@ -61,7 +61,7 @@ public:
 
 private:
     /// Shows the folder with this access, limited by the shares between it and `outer`.
-    Result<> showOne(UniqueFd folder, const std::filesystem::path& outer, Access access);
+    Result<> showOne(OpenedFolder folder, const std::filesystem::path& outer, Access access);
     Result<> addShare(SideBySide& view, const ShareEntry& share, Access access);
 
     const Login& login_;
@@ -70,16 +70,12 @@ private:
     Grants grants_;
 };
 
-Result<> ViewMaker::showOne(UniqueFd folder, const std::filesystem::path& outer, Access access) {
-    const auto place = placeOf(folder);
-    if (!place) {
-        return place.error();
-    }
-    access = grants_.leastAt(*place, outer, access);
+Result<> ViewMaker::showOne(OpenedFolder folder, const std::filesystem::path& outer, Access access) {
+    access = grants_.leastAt(folder.place, outer, access);
     if (access == Access::none) {
-        return refuse("The shares grant the user no access to " + place->string() + ".");
+        return refuse("The shares grant the user no access to " + folder.place.string() + ".");
     }
-    return showFolder(root_, {std::move(folder), access, grants_.restrictionsBelow(*place, access)});
+    return showFolder(root_, {std::move(folder.fd), access, grants_.restrictionsBelow(folder.place, access)});
 }
 
 Result<> ViewMaker::showHome() {
@@ -87,15 +83,12 @@ Result<> ViewMaker::showHome() {
     if (!home) {
         return home.error();
     }
-    const auto place = placeOf(*home);
-    if (!place) {
-        return place.error();
-    }
-    if (*place == "/") {
+    if (home->place == "/") {
         return refuse("The user's home is \"/\", the whole server.");
     }
     // Shares around the home do not count, since it is the user's own; a share that is the home does.
-    return showOne(std::move(*home), place->parent_path(), Access::write);
+    const auto outer = home->place.parent_path();
+    return showOne(std::move(*home), outer, Access::write);
 }
 
 Result<> ViewMaker::showInShare(const std::string& path) {
@@ -112,31 +105,23 @@ Result<> ViewMaker::showInShare(const std::string& path) {
     if (!folder) {
         return folder.error();
     }
-    const auto outer = placeOf(*folder);
-    if (!outer) {
-        return outer.error();
-    }
+    const auto outer = folder->place;
     if (end < path.size()) {
-        folder = openFolderBelow(login_.user, *folder, path.substr(end + 1));
+        folder = openFolderBelow(login_.user, folder->fd, path.substr(end + 1));
     }
-    return folder ? showOne(std::move(*folder), *outer, access) : folder.error();
+    return folder ? showOne(std::move(*folder), outer, access) : folder.error();
 }
 
 Result<> ViewMaker::addShare(SideBySide& view, const ShareEntry& share, Access access) {
     auto folder = openFolderAs(login_.user, share.path);
-    if (!folder) {
-        return folder.error();
-    }
-    const auto place = placeOf(*folder);
-    if (!place) {
-        return place.error();
-    }
-    return view.add(share.name, {std::move(*folder), access, grants_.restrictionsBelow(*place, access)});
+    return folder ? view.add(share.name, {std::move(folder->fd), access,
+                                          grants_.restrictionsBelow(folder->place, access)})
+                  : folder.error();
 }
 
 Result<> ViewMaker::showShares() {
     SideBySide view(root_);
-    if (const Result<> begun = view.begin(); !begun) {
+    if (Result<> begun = view.begin(); !begun) {
         return begun;
     }
     for (const ShareEntry& share : shares_) {

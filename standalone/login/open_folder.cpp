@@ -62,6 +62,20 @@ Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& 
     return cannot("open", placeOf(folder).valueOr({}) / path, error);
 }
 
+/// Opens with the user's rights, and looks for the place without them again.
+template<class Open>
+Result<OpenedFolder> openAs(const Identity& user, const std::filesystem::path& path, Open&& open) {
+    Result<UniqueFd> folder = [&]() -> Result<UniqueFd> {
+        const FileRightsOf rights(user);
+        return rights.taken() ? open() : cannot("open", path, EPERM);
+    }();
+    if (!folder) {
+        return folder.error();
+    }
+    const auto place = placeOf(*folder);
+    return place ? Result<OpenedFolder>(OpenedFolder{std::move(*folder), *place}) : place.error();
+}
+
 } // namespace
 
 Result<UniqueFd> openFolder(const std::filesystem::path& path) {
@@ -69,16 +83,14 @@ Result<UniqueFd> openFolder(const std::filesystem::path& path) {
     return folder ? Result<UniqueFd>(std::move(folder)) : cannot("open", path);
 }
 
-Result<UniqueFd> openFolderAs(const Identity& user, const std::filesystem::path& path) {
-    const FileRightsOf rights(user);
-    return rights.taken() ? openFolder(path) : cannot("open", path, EPERM);
+Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::path& path) {
+    return openAs(user, path, [&] { return openFolder(path); });
 }
 
-Result<UniqueFd> openFolderBelow(const Identity& user, const UniqueFd& folder,
-                                 const std::filesystem::path& path) {
-    const FileRightsOf rights(user);
-    return rights.taken() ? openBelow(folder, path, RESOLVE_BENEATH | RESOLVE_NO_MAGICLINKS)
-                          : cannot("open", path, EPERM);
+Result<OpenedFolder> openFolderBelow(const Identity& user, const UniqueFd& folder,
+                                     const std::filesystem::path& path) {
+    return openAs(user, path,
+                  [&] { return openBelow(folder, path, RESOLVE_BENEATH | RESOLVE_NO_MAGICLINKS); });
 }
 
 Result<UniqueFd> openFolderExactly(const UniqueFd& folder, const std::filesystem::path& path) {

@@ -12,17 +12,22 @@ namespace velt {
 
 // The descriptors only refer to the folders (O_PATH).
 
+struct OpenedFolder {
+    UniqueFd fd;
+    std::filesystem::path place; ///< see placeOf
+};
+
 /// With root's rights; follows symbolic links.
 Result<UniqueFd> openFolder(const std::filesystem::path& path);
 
 /// With the user's rights; follows symbolic links. For a path that the user may have made: a home, or a share
 /// within a writable one.
-Result<UniqueFd> openFolderAs(const Identity& user, const std::filesystem::path& path);
+Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::path& path);
 
 /// With the user's rights, and never outside `folder`, even while folders and links are being moved. `path`
 /// is relative and not empty.
-Result<UniqueFd> openFolderBelow(const Identity& user, const UniqueFd& folder,
-                                 const std::filesystem::path& path);
+Result<OpenedFolder> openFolderBelow(const Identity& user, const UniqueFd& folder,
+                                     const std::filesystem::path& path);
 
 /// With root's rights; an error when `path` leads through a symbolic link.
 Result<UniqueFd> openFolderExactly(const UniqueFd& folder, const std::filesystem::path& path);

@@ -78,7 +78,7 @@ Result<> restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& re
         if (std::ranges::any_of(hidden, [&](const auto& outer) { return isWithin(place, outer); })) {
             continue;
         }
-        if (const Result<> done = coverOne(tree, restriction); !done) {
+        if (Result<> done = coverOne(tree, restriction); !done) {
             return done;
         }
         if (restriction.access == Access::none) {

@@ -1,12 +1,9 @@
 #include "standalone/rules/chroot_users.h"
 
-#include "standalone/core/error_number.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/rules/rule_store.h"
 
 #include <algorithm>
-#include <string_view>
-#include <unordered_map>
 #include <unordered_set>
 
 namespace velt {
@@ -64,28 +61,14 @@ std::vector<std::string> unlistedNames(Ids ids, const std::vector<UserEntry>& li
     return names;
 }
 
-/// The numbers of the users, without repetition, in their order.
 Result<std::vector<uid_t>> idsOf(const std::vector<std::string>& names) {
-    const auto users = allUsers();
-    std::unordered_map<std::string_view, uid_t> byName;
-    // Of two users with one name the first is the one who logs in.
-    for (const UserEntry& user : *users) {
-        byName.try_emplace(user.name, user.uid);
-    }
     std::vector<uid_t> ids;
-    Ids seen;
     for (const std::string& name : names) {
-        auto found = byName.find(name);
-        if (found == byName.end()) {
-            const auto user = userByName(name);
-            if (!user) {
-                return Error(ErrorNumber::notFound, "There is no user \"" + name + "\".");
-            }
-            found = byName.emplace(name, user->uid).first;
+        const auto user = findUser(name);
+        if (!user) {
+            return user.error();
         }
-        if (seen.insert(found->second).second) {
-            ids.push_back(found->second);
-        }
+        ids.push_back(user->uid);
     }
     return ids;
 }
@@ -106,7 +89,7 @@ void addRules(Rules& rules, const std::vector<uid_t>& ids) {
         changed.push_back(std::move(rule));
     }
     for (const uid_t uid : ids) {
-        if (!done.contains(uid)) {
+        if (done.insert(uid).second) {
             changed.push_back({true, uid, std::string(homePath)});
         }
     }

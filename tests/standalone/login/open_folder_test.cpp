@@ -27,7 +27,7 @@ protected:
     std::string below(const fs::path& path) {
         const auto share = openFolder(share_);
         const auto folder = openFolderBelow(user_, *share, path);
-        return folder ? placeOf(*folder)->lexically_relative(share_) : fs::path("(refused)");
+        return folder ? folder->place.lexically_relative(share_) : fs::path("(refused)");
     }
 
     TemporaryFolder root_;
