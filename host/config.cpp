@@ -1,20 +1,18 @@
 #include "host/config.h"
 
-#include "host/base/file_text.h"
+#include "base/file.h"
 #include "host/base/json.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <charconv>
 #include <functional>
 #include <map>
-#include <system_error>
 
 namespace velt::host {
 
 namespace {
 
-/// What a setting takes instead of the value that it was given.
+/// A setting has a value that it does not take.
 struct BadValue {
     std::string expected;
 };
@@ -58,7 +56,7 @@ std::size_t number(const std::string& text, Range range) {
 
 const std::string& notEmpty(const std::string& text) {
     if (text.empty()) {
-        throw BadValue{"a text that is not empty"};
+        throw BadValue{"a non-empty text"};
     }
     return text;
 }
@@ -144,7 +142,7 @@ std::vector<std::string> valuesOf(const Json::Value& value, Form form) {
         }
         return value.asBool() ? std::vector<std::string>{""} : std::vector<std::string>{};
     case Form::number:
-        // Whatever is no whole number is told by the setting, which knows its range.
+        // The setting refuses what is not a whole number: it knows the range.
         return {value.isIntegral() ? value.asString() : ""};
     case Form::text:
         if (!value.isString()) {
@@ -166,11 +164,10 @@ std::vector<std::string> valuesOf(const Json::Value& value, Form form) {
     return texts;
 }
 
-void readFile(Config& config, const std::string& file) {
-    const auto content = readFileText(file);
+void readConfigFile(Config& config, const std::string& file) {
+    const auto content = readFile(file);
     if (!content) {
-        throw ConfigError("The configuration file " + file +
-                          " cannot be read: " + std::generic_category().message(errno) + ".");
+        throw ConfigError(content.error().message);
     }
     const auto settings = parseObject(*content);
     if (!settings) {
@@ -182,7 +179,7 @@ void readFile(Config& config, const std::string& file) {
         place.append(": \"").append(name).append("\"");
         const Setting* const setting = settingNamed(name);
         if (setting == nullptr) {
-            throw ConfigError(place + " is no setting. --help lists them.");
+            throw ConfigError(place + " is not a setting. --help lists them.");
         }
         const Json::Value& value = (*settings)[name];
         try {
@@ -195,8 +192,8 @@ void readFile(Config& config, const std::string& file) {
     }
 }
 
-/// Lists in the file are replaced, not lengthened, by those of the command line: a host that listens where
-/// the administrator did not ask for is worse than one that does not.
+/// A list on the command line replaces the file's instead of extending it: a host must not listen where the
+/// administrator did not ask it to.
 void forgetLists(Config& config, const std::string& name) {
     if (name == "listen") {
         config.listen.clear();
@@ -212,10 +209,10 @@ void check(const Config& config) {
         return;
     }
     if (config.modules.empty()) {
-        throw ConfigError("Name at least one module to load: --module FILE.");
+        throw ConfigError("No module is given: use --module FILE.");
     }
     if (config.tls.certificate.empty() != config.tls.key.empty()) {
-        throw ConfigError("A TLS certificate needs its key, and a key its certificate.");
+        throw ConfigError("--tls-certificate and --tls-key must be given together.");
     }
     if (config.allowRemote && config.tls.certificate.empty()) {
         throw ConfigError("--allow-remote needs --tls-certificate and --tls-key.");
@@ -228,7 +225,7 @@ struct Word {
     std::string value;
 };
 
-/// Takes the words apart, and notes those that are questions.
+/// Splits the words into options. Sets `help` and `version` in the configuration.
 std::vector<Word> readWords(const std::vector<std::string>& words, Config& config) {
     std::vector<Word> given;
     for (std::size_t i = 0; i < words.size(); ++i) {
@@ -238,7 +235,7 @@ std::vector<Word> readWords(const std::vector<std::string>& words, Config& confi
         const Setting* const setting = settingNamed(name);
         const bool question = name == "help" || name == "version";
         if (!words[i].starts_with("--") || (setting == nullptr && name != "config" && !question)) {
-            throw ConfigError("\"" + words[i] + "\" is no option. --help lists them.");
+            throw ConfigError("\"" + words[i] + "\" is not an option. --help lists them.");
         }
         config.help = config.help || name == "help";
         config.version = config.version || name == "version";
@@ -269,7 +266,7 @@ Config readConfig(const std::vector<std::string>& words) {
     const std::vector<Word> given = readWords(words, config);
     for (const Word& word : given) {
         if (word.name == "config") {
-            readFile(config, word.value);
+            readConfigFile(config, word.value);
         }
     }
     for (const Word& word : given) {
@@ -292,24 +289,23 @@ Config readConfig(const std::vector<std::string>& words) {
 const char* usage() {
     return "Usage: veltd --module FILE [OPTION]...\n"
            "Serves the modules' APIs over HTTP.\n\n"
-           "  --config FILE            read settings from a file: a JSON object whose keys are options of "
-           "here,\n"
-           "                           the command line goes before it\n"
-           "  --module FILE            load this module; may be given several times\n"
-           "  --state-root DIR         where all state lies (/)\n"
+           "  --config FILE            read settings from a JSON object whose keys are these options;\n"
+           "                           options given here override it\n"
+           "  --module FILE            load this module; may be repeated\n"
+           "  --state-root FOLDER      the folder that holds all state (/)\n"
            "  --socket PATH            the Unix socket (run/velt/veltd.sock below the state root)\n"
-           "  --listen ADDRESS:PORT    listen on TCP, too; may be given several times\n"
-           "  --allow-remote           permit addresses that other machines reach; needs TLS\n"
-           "  --tls-certificate FILE   PEM file of the certificate with its chain\n"
-           "  --tls-key FILE           PEM file of its private key\n"
-           "  --host-name NAME         a name that clients use for this host; may be given several times\n"
+           "  --listen ADDRESS:PORT    also listen on TCP; may be repeated\n"
+           "  --allow-remote           allow addresses that other machines can reach; needs TLS\n"
+           "  --tls-certificate FILE   the certificate with its chain, PEM\n"
+           "  --tls-key FILE           its private key, PEM\n"
+           "  --host-name NAME         a name that clients use for this host; may be repeated\n"
            "  --admin-group NAME       the group whose members may use the Unix socket (velt-admin)\n"
            "  --max-head BYTES         (16384)     --head-seconds N   (10)\n"
            "  --max-body BYTES         (1048576)   --body-seconds N   (30)\n"
            "  --max-connections N      (1000)      --idle-seconds N   (30)\n"
            "  --io-threads N           (2)         --write-seconds N  (20)\n"
            "  --workers N              (4)         --stop-seconds N   (60)\n"
-           "  --print-ready            print one line of JSON when it listens, with the real ports\n"
+           "  --print-ready            when it listens, print one line of JSON with the real ports\n"
            "  --help, --version\n";
 }
 

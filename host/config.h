@@ -11,7 +11,7 @@
 
 namespace velt::host {
 
-/// The settings do not make sense; what() is a sentence for the administrator.
+/// The settings are wrong; what() is a sentence for the administrator.
 class ConfigError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
@@ -38,8 +38,8 @@ struct Config {
     std::filesystem::path tokenFile() const;
 };
 
-/// Reads the words after the program's name. A setting of the command line, also a list, replaces that of a
-/// configuration file. Throws ConfigError, which names the option or key and what it takes.
+/// Reads the words after the program's name. An option on the command line overrides that of the
+/// configuration file, lists included. Throws ConfigError, which names the option or key and what it takes.
 Config readConfig(const std::vector<std::string>& words);
 
 /// What --help prints.

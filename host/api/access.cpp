@@ -20,7 +20,7 @@ std::string lowered(std::string text) {
     return text;
 }
 
-/// "[::1]:8080" is "::1" and "8080".
+/// Splits "[::1]:8080" into "::1" and "8080".
 std::pair<std::string, std::string> splitHost(const std::string& host) {
     if (host.starts_with('[')) {
         const std::size_t end = host.find(']');
@@ -33,7 +33,7 @@ std::pair<std::string, std::string> splitHost(const std::string& host) {
     return {host.substr(0, colon), colon == std::string::npos ? "" : host.substr(colon + 1)};
 }
 
-/// Whether a browser says that the request comes from a page of another origin.
+/// Whether a browser says that a page of another origin made it send the request.
 bool isForeignPage(const HttpRequest& head, const Peer& peer) {
     if (!head.fetchSite.empty() && head.fetchSite != "same-origin" && head.fetchSite != "none") {
         return true;
@@ -55,11 +55,13 @@ std::optional<Refusal> Access::check(const HttpRequest& head, const Peer& peer, 
         return std::nullopt;
     }
     if (!peer.isUnixSocket && !knowsHost(head.host, peer)) {
-        return refuse(403, "The Host header names \"" + head.host + "\", which is not this host.", peer,
-                      false);
+        return refuse(403,
+                      "The Host header names \"" + head.host +
+                          "\", which is not this host. If it is, add it with --host-name.",
+                      peer, false);
     }
     if (isForeignPage(head, peer)) {
-        return refuse(403, "Requests from pages of another origin are not served.", peer, false);
+        return refuse(403, "Requests from web pages of another origin are refused.", peer, false);
     }
     return std::nullopt;
 }
@@ -69,7 +71,7 @@ std::optional<Refusal> Access::authenticate(const HttpRequest& head, const Peer&
     principal.address = peer.address;
     if (head.authorization.empty()) {
         if (!peer.isUnixSocket) {
-            return refuse(401, "Send a token: \"Authorization: Bearer TOKEN\".", peer, false);
+            return refuse(401, "A token is required: \"Authorization: Bearer TOKEN\".", peer, false);
         }
         if (!isAdmin(peer)) {
             return refuse(403,

@@ -1,8 +1,8 @@
-// Who may talk to the host.
+// Who may use the host.
 //
-// A Unix socket's peer is known by the kernel: root, the host's own user and the members of the
-// administrators' group are admins. Everybody else shows a bearer token. Requests that a page of another
-// origin makes a browser send are refused whoever sends them.
+// The kernel names the peer of a Unix socket: root, the host's own user and the members of the
+// administrators' group are admins. Everybody else needs a bearer token. What a page of another origin makes
+// a browser send is refused in any case.
 #ifndef VELT_HOST_API_ACCESS_H
 #define VELT_HOST_API_ACCESS_H
 
@@ -19,7 +19,7 @@ namespace velt::host {
 struct AccessSettings {
     std::string adminGroup = "velt-admin";
     std::vector<std::string>
-        hostNames; ///< that clients may use for this host beside its addresses and "localhost"
+        hostNames; ///< that clients may use for this host, besides its addresses and "localhost"
 };
 
 /// Thread-safe.
@@ -28,7 +28,7 @@ public:
     /// The store and the log outlive it.
     Access(AccessSettings settings, const TokenStore& tokens, HostLog& log);
 
-    /// Fills `principal` and returns nothing when the request may go on.
+    /// Fills `principal` and returns nothing when access is granted.
     std::optional<Refusal> check(const HttpRequest& head, const Peer& peer, Principal& principal) const;
 
 private:

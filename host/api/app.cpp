@@ -30,13 +30,13 @@ void finish(const HttpHandler::Done& done, const Call& call, HttpResponse respon
 }
 
 HttpResponse notFound(const Call& call) {
-    return problem(404, "Nothing is served at " + call.request.path() + ". GET /api lists the rows.",
+    return problem(404, "There is nothing at " + call.request.path() + ". GET /api lists what is served.",
                    call.id);
 }
 
 HttpResponse notAllowed(const Call& call, const std::string& allow) {
     HttpResponse response = problem(
-        405, "The method " + call.request.method + " is not served here, only " + allow + ".", call.id);
+        405, "The method " + call.request.method + " is not allowed here, only " + allow + ".", call.id);
     response.headers.emplace_back("Allow", allow);
     return response;
 }
@@ -107,7 +107,7 @@ void App::route(const JobPointer& job) {
     Call& call = job->call;
     auto path = pathSegments(call.request.path());
     if (!path) {
-        finish(job->done, call, problem(400, "The path is not percent-encoded UTF-8.", call.id));
+        finish(job->done, call, problem(400, "The path is not valid percent-encoded UTF-8.", call.id));
         return;
     }
     call.path = std::move(*path);
@@ -150,7 +150,7 @@ HttpResponse App::answer(const Route& route, const Call& call) {
 
 HttpResponse App::internalError(const std::string& reason, const Call& call) {
     log_.write(call.id, "internal error: " + reason);
-    return problem(500, "The host failed. Its log says more under this request id.", call.id);
+    return problem(500, "veltd failed. Its log has the reason under this request id.", call.id);
 }
 
 } // namespace velt::host

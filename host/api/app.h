@@ -1,4 +1,4 @@
-// Leads requests to the resources that answer them, in the order that they need.
+// Routes each request to the resource that answers it, and runs them in the right order.
 #ifndef VELT_HOST_API_APP_H
 #define VELT_HOST_API_APP_H
 
@@ -41,11 +41,11 @@ public:
     HttpResponse failure(int status, const std::string& detail) override;
     void addEventReader(const std::shared_ptr<EventReader>& reader) override;
 
-    /// Finishes the requests that were accepted and accepts no more.
+    /// Finishes the accepted requests and accepts no more.
     void stop() { order_.stop(); }
 
 private:
-    /// A call on its way.
+    /// A call that is being answered.
     struct Job {
         Call call;
         Done done;
@@ -67,7 +67,7 @@ private:
     PlatformEvents platformEvents_;
     Rows rows_;
     std::vector<Route> routes_;
-    RequestOrder order_; // the last, so that its threads end before what they use
+    RequestOrder order_; // last, so that its threads end before what they use
 };
 
 } // namespace velt::host

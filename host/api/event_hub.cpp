@@ -6,7 +6,7 @@ namespace velt::host {
 
 void EventHub::add(const std::shared_ptr<EventReader>& reader) {
     const std::lock_guard lock(mutex_);
-    // Readers may come and go for a long time before there is an event.
+    // Readers may come and go for a long time without an event.
     forgetThoseThatLeft();
     readers_.push_back(reader);
 }
@@ -22,7 +22,7 @@ void EventHub::forgetThoseThatLeft() {
 }
 
 void EventHub::publish(const std::string& type, const Json::Value& data) {
-    // JSON of one line holds no line end, so one data line is enough.
+    // The JSON has no line breaks, so one data line is enough.
     const auto event =
         std::make_shared<const std::string>("event: " + type + "\ndata: " + toJson(data) + "\n\n");
     const std::lock_guard lock(mutex_);

@@ -1,4 +1,4 @@
-// The stream of events: hands each event to all who read it.
+// Delivers each event to everybody who reads the stream of events.
 #ifndef VELT_HOST_API_EVENT_HUB_H
 #define VELT_HOST_API_EVENT_HUB_H
 
@@ -17,10 +17,10 @@ namespace velt::host {
 /// Thread-safe.
 class EventHub {
 public:
-    /// The hub forgets a reader that nobody else holds any more.
+    /// The hub does not keep the reader alive.
     void add(const std::shared_ptr<EventReader>& reader);
 
-    /// Those that still read.
+    /// How many are reading.
     std::size_t readers();
 
     /// Sends {event: type, data: data} to all readers. Does not block.

@@ -8,7 +8,7 @@
 
 namespace velt::host {
 
-/// Hands what the platform announces to the hub while it lives.
+/// Publishes what the platform announces, for its lifetime.
 class PlatformEvents {
 public:
     /// The hub outlives it.

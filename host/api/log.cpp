@@ -16,7 +16,7 @@ namespace {
 
 constexpr int maxLimit = 1000;
 
-/// What a filter takes instead of what it was given.
+/// A filter has a value that it does not take.
 struct BadFilter {
     FieldError error;
 };
@@ -42,13 +42,13 @@ std::optional<unsigned> eventNumber(const std::string& text) {
     return value && *value > 0 ? value : std::nullopt;
 }
 
-/// Forms write a blank as "+".
+/// HTML forms encode a space as "+".
 std::optional<std::string> queryValue(std::string text) {
     std::replace(text.begin(), text.end(), '+', ' ');
     return percentDecoded(text);
 }
 
-/// Each filter: its key, what it takes, and a function that takes it over and says whether it was that.
+/// `take` returns false for a value other than the expected.
 struct Filter {
     const char* key;
     const char* expected;
@@ -92,9 +92,9 @@ void takeFilter(const std::string& key, const std::string& text, LogFilter& filt
     const auto* const known =
         std::find_if(filters.begin(), filters.end(), [&key](const Filter& each) { return each.key == key; });
     if (known == filters.end()) {
-        throw BadFilter{{key, "one of since, event, actor, before and limit"}};
+        throw BadFilter{{key, "one of since, event, actor, before or limit"}};
     }
-    // An empty filter does not narrow.
+    // An empty filter lets everything through.
     if (!value->empty() && !known->take(*value, filter)) {
         throw BadFilter{{key, known->expected}};
     }
@@ -112,7 +112,7 @@ LogFilter parseQuery(const std::string& query) {
     return filter;
 }
 
-/// The id to ask on from after this page; null when no entry comes after it.
+/// What "before" has to be for the next page; null when there is none.
 Result<Json::Value> nextAfter(const std::vector<LogEntry>& page, LogFilter filter) {
     if (page.size() < static_cast<std::size_t>(filter.limit)) {
         return Json::Value();

@@ -92,7 +92,7 @@ void Metrics::setService(const std::string& service, bool wanted, bool running) 
 void Metrics::setDaemonRestarts(const std::string& daemon, std::uint64_t count) {
     const std::lock_guard lock(families_->mutex);
     std::uint64_t& seen = families_->seenRestarts[daemon];
-    // Less than before: it was counted anew from 0.
+    // Less than before: the count began at 0 again.
     families_->restarts.Add({{"daemon", daemon}})
         .Increment(static_cast<double>(count >= seen ? count - seen : count));
     seen = count;

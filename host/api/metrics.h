@@ -24,16 +24,16 @@ public:
     /// Counts a served request under "success", the module's code, "service_down" or "defect".
     void countRequest(const Row& row, const Outcome& outcome);
 
-    /// Counts an answer that no module had a part in, by its status.
+    /// Counts, by its status, an answer that no module took part in.
     void countRefusal(int status);
 
     void setService(const std::string& service, bool wanted, bool running);
 
-    /// Counts a start that was asked for.
+    /// Counts a start that a request asked for.
     void countDaemonStart(const std::string& service);
 
-    /// Takes over how often a daemon was started again after it had ended by itself, as counted elsewhere:
-    /// from 0 since some earlier moment.
+    /// Takes over a count, kept elsewhere, of how often a daemon was started again after it ended by itself.
+    /// It may begin at 0 again.
     void setDaemonRestarts(const std::string& daemon, std::uint64_t count);
 
     void setEventReaders(std::size_t count);

@@ -24,7 +24,7 @@ std::string pathOf(const Row& row) {
     return "/api/" + row.api + "/v" + std::to_string(row.version) + "/" + row.method;
 }
 
-/// "<root>", "[rules]", "[2]" is "rules", "2".
+/// Turns "<root>", "[rules]", "[2]" into "rules", "2".
 Path withoutBrackets(const Path& context) {
     Path path;
     for (std::size_t i = 1; i < context.size(); ++i) {
@@ -34,7 +34,7 @@ Path withoutBrackets(const Path& context) {
     return path;
 }
 
-/// "rules", "2", "name" is "rules[2].name".
+/// Turns "rules", "2", "name" into "rules[2].name".
 std::string fieldName(const Path& path) {
     std::string name;
     for (const std::string& element : path) {
@@ -49,7 +49,7 @@ std::string fieldName(const Path& path) {
     return name;
 }
 
-/// The property that the validator misses, or "": it says so only in words.
+/// The property that the validator reports as missing, which it does in words only; "" for other reports.
 std::string missingProperty(const std::string& description) {
     constexpr std::string_view words = "Missing required property '";
     if (!description.starts_with(words)) {
@@ -103,7 +103,7 @@ std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& para
         return errors;
     }
     const Schemas::Body& body = *found->second;
-    // Strict types, as the module's: the text "21" is no number.
+    // As strict about types as the module: the text "21" is not a number.
     valijson::Validator validator(valijson::Validator::kStrongTypes);
     valijson::ValidationResults results;
     validator.validate(body.compiled, Adapter(parameters), &results);
@@ -116,7 +116,7 @@ std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& para
         const std::string field = fieldName(path);
         const bool known = std::any_of(errors.begin(), errors.end(),
                                        [&field](const FieldError& each) { return each.field == field; });
-        // Of nested schemas the validator also reports the outer ones, which say nothing new.
+        // The validator reports the outer schemas of a nested one as well, which adds nothing.
         const bool holdsOther = std::any_of(errors.begin(), errors.end(), [&field](const FieldError& each) {
             return field.empty() || each.field.starts_with(field + "[") ||
                    each.field.starts_with(field + ".");

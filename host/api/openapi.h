@@ -1,4 +1,4 @@
-// The description of the API, and what it can tell about parameters that a module refused.
+// The description of the API, which also explains why parameters were refused.
 #ifndef VELT_HOST_API_OPENAPI_H
 #define VELT_HOST_API_OPENAPI_H
 
@@ -14,10 +14,10 @@
 
 namespace velt::host {
 
-/// Constant once made; safe to use from any thread.
+/// Constant, so thread-safe.
 class OpenApi {
 public:
-    /// Reads the document that was built in. Throws std::runtime_error when it is no such document.
+    /// Reads the built-in document. Throws std::runtime_error when that is damaged.
     OpenApi();
     ~OpenApi();
     OpenApi(const OpenApi&) = delete;
@@ -29,8 +29,8 @@ public:
     /// Whether the document describes the row's parameters.
     bool describes(const Row& row) const;
 
-    /// The fields that break the description of the row's parameters, and what it expects of each. Only
-    /// explains: whether a request is accepted is the module's to say.
+    /// The parameters that do not match the row's schema, and what it expects of each. This only explains:
+    /// the module decides whether a request is accepted.
     std::vector<FieldError> explain(const Row& row, const Json::Value& parameters) const;
 
 private:

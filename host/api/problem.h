@@ -11,22 +11,22 @@
 
 namespace velt::host {
 
-/// A field that is not what it must be.
+/// A field with a wrong value.
 struct FieldError {
     std::string field;    ///< "portnum", "rules[2].name"
     std::string expected; ///< "an integer from 1 to 65535"
 };
 
-/// A problem that the module had no part in; its title is the reason phrase.
+/// A problem that no module took part in; its title is the reason phrase.
 HttpResponse problem(int status, const std::string& detail, const std::string& requestId);
 
-/// A problem with the members given; those of RFC 9457 are filled in when they are missing.
+/// A problem with these members; missing ones of RFC 9457 are filled in.
 HttpResponse problemWith(int status, Json::Value members, const std::string& requestId);
 
-/// A body that is not a JSON object, for the reason given; `extent` says what became of the request.
+/// A body that is not a JSON object, for the reason given; `extent` says what was done.
 HttpResponse notAnObject(const Error& reason, const std::string& extent, const std::string& requestId);
 
-/// A problem with one field of what was sent; `extent` says what became of the request.
+/// A problem with one field of what was sent; `extent` says what was done.
 HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
                           const std::string& requestId);
 

@@ -1,4 +1,4 @@
-// Which state of the settings an answer tells of, so that a client can change only what it has seen.
+// Names the state of the settings that an answer shows, so that a client changes only what it has seen.
 #ifndef VELT_HOST_API_REVISION_H
 #define VELT_HOST_API_REVISION_H
 
@@ -13,13 +13,13 @@ class Revision {
 public:
     Revision();
 
-    /// As an entity tag, in its quotes. No two runs of the host share one.
+    /// As an entity tag, with its quotes. Unique among all runs of the host.
     std::string tag() const;
 
     /// Something was changed.
     void advance() { ++count_; }
 
-    /// Whether a request with this If-Match may go on: "", "*", or a list that has the tag.
+    /// Whether this If-Match allows the request: it is "", "*", or a list that contains the tag.
     bool allows(const std::string& ifMatch) const;
 
 private:

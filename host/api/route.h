@@ -25,7 +25,7 @@ struct Route {
     std::vector<std::string> path; ///< its segments; "*" stands for any one
     bool adminOnly;
     RequestOrder::Kind kind;
-    std::function<HttpResponse(const Call&)> answer; ///< none: a stream of events
+    std::function<HttpResponse(const Call&)> answer; ///< empty: the server makes it a stream of events
 };
 
 } // namespace velt::host

@@ -22,7 +22,7 @@ constexpr int badParameter = 1901;
 constexpr Meaning otherFailure{0, 500, "The operation failed", false};
 
 constexpr std::array<Meaning, 6> meanings{{
-    {badParameter, 422, "A parameter is not acceptable", false},
+    {badParameter, 422, "A parameter is invalid", false},
     {1902, 500, "The operation failed", false},
     {1903, 409, "The FTP port is taken", true},
     {1904, 409, "The passive port range is taken", true},
@@ -50,7 +50,7 @@ std::string describe(const FieldError& error) {
     return error.field + ": expected " + error.expected + ".";
 }
 
-/// How far a change got that the module has refused.
+/// How far a refused change got.
 std::string extentOf(const PlatformReport& platform) {
     if (!platform.changed) {
         return "Nothing was changed.";
@@ -99,12 +99,11 @@ HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<F
     return problemWith(meaning.status, std::move(members), requestId);
 }
 
-/// The module is content, but what is switched on does not run.
+/// The module accepted the change, but a service that is switched on does not run.
 HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
     Json::Value members(Json::objectValue);
     members["title"] = "A service that is switched on does not run";
-    members["detail"] =
-        "What was asked for is stored, but a service does not follow. " + sentenceOf(outcome.down);
+    members["detail"] = "The change is stored. " + sentenceOf(outcome.down);
     members["changed"] = outcome.platform.changed;
     for (const ServiceDown& each : outcome.down) {
         members["down"].append(toObject(each));
@@ -129,8 +128,8 @@ HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outc
                        requestId);
     default:
         return problem(500,
-                       "The module did not answer as it must: " + outcome.defect +
-                           ". The host's log has more under this request's id.",
+                       "The module is faulty: " + outcome.defect +
+                           ". The log of veltd says more under this request id.",
                        requestId);
     }
 }

@@ -1,4 +1,4 @@
-// How the outcome of a module's call looks on the wire.
+// The answer to a call of a module.
 #ifndef VELT_HOST_API_ROW_ANSWER_H
 #define VELT_HOST_API_ROW_ANSWER_H
 
@@ -10,8 +10,8 @@
 
 namespace velt::host {
 
-/// 200 with the value or 204; else a problem with the module's code, what an administrator can act on, and
-/// for refused parameters the fields that broke their description.
+/// 200 with the value, or 204; else a problem with the module's code, a detail that an administrator can act
+/// on, and for refused parameters the fields that do not match their schema.
 HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outcome& outcome,
                        const OpenApi& openApi, const std::string& requestId);
 

@@ -62,7 +62,7 @@ HttpResponse Rows::call(const Row& row, const Call& call) {
     if (!parameters) {
         return notAnObject(parameters.error(), " Nothing was changed.", call.id);
     }
-    // Writes run one at a time, so nothing comes between this look and the change.
+    // Writes run one at a time, so nothing can come between this check and the change.
     if (!row.reads() && !revision_.allows(call.request.ifMatch)) {
         return problem(412, "The settings have changed since they were read. Nothing was changed.", call.id);
     }
@@ -73,7 +73,7 @@ HttpResponse Rows::callAndAnswer(const Row& row, const Json::Value& parameters, 
     Outcome outcome = callRow(row, parameters, call.principal.actor, call.principal.address);
     countStarts(outcome.platform);
     if (!row.reads() && outcome.kind == Outcome::Kind::success) {
-        // A change that found nothing to do must not hide that an earlier one ended half-way.
+        // A change that finds nothing to do must not hide that an earlier one failed half-way.
         outcome.down = startWhatIsDown(call.principal);
     }
     HttpResponse response = answerFor(row, parameters, outcome, openApi_, call.id);
@@ -95,7 +95,7 @@ std::vector<ServiceDown> Rows::startWhatIsDown(const Principal& principal) {
         return down;
     }
     PlatformRequest platform(principal.actor, principal.address);
-    startEnabledServices(); // what fails shows in what is still down
+    startEnabledServices(); // servicesDown tells what failed
     countStarts(platform.finish());
     return servicesDown();
 }

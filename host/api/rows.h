@@ -16,7 +16,7 @@
 
 namespace velt::host {
 
-/// Thread-safe, when reads and writes are ordered as its routes say.
+/// Thread-safe if reads and writes are ordered as its routes say.
 class Rows {
 public:
     /// All of these outlive it.

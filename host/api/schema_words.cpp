@@ -6,7 +6,7 @@ namespace velt::host {
 
 namespace {
 
-/// The type that is not null: an optional parameter may be null, but nobody means that.
+/// The type besides null: an optional parameter may be null, but nobody wants to read that.
 std::string typeOf(const Json::Value& schema) {
     const Json::Value& type = schema["type"];
     if (!type.isArray()) {
@@ -54,12 +54,12 @@ std::string wordsFor(const Json::Value& schema) {
         return integerWords(schema);
     }
     if (type == "string") {
-        return schema["minLength"].asInt() > 0 ? "a text that is not empty" : "a text";
+        return schema["minLength"].asInt() > 0 ? "a non-empty text" : "a text";
     }
     if (type == "array") {
         return schema["minItems"].asInt() > 0 ? "a list with at least one element" : "a list";
     }
-    return type == "object" ? "an object" : "another value";
+    return type == "object" ? "an object" : "a different value";
 }
 
 } // namespace
@@ -73,7 +73,7 @@ std::string expectationOf(const Json::Value& schema, const std::vector<std::stri
         } else if ((*place)["items"].isObject()) {
             place = &(*place)["items"];
         } else {
-            return "another value";
+            return "a different value";
         }
     }
     const std::string words = wordsFor(*place);

@@ -10,7 +10,7 @@
 namespace velt::host {
 
 /// What the schema expects at the path of property names and array indices: "an integer from 1 to 65535",
-/// "true or false". "another value" when the schema does not say.
+/// "true or false". "a different value" when the schema does not say.
 std::string expectationOf(const Json::Value& schema, const std::vector<std::string>& path);
 
 } // namespace velt::host

@@ -11,9 +11,9 @@ namespace velt::host {
 
 namespace {
 
-/// Which services the stored settings ask for. A "get" may tell the state of the moment, while every "set"
-/// has to name the wanted one: a client that changes one setting alone needs to know what is stored, or it
-/// would switch off for good what is just down.
+/// Which services the stored settings ask for. The answer of "get" may be the state of this moment, but every
+/// "set" has to name the wanted one: a client that changes a single setting needs to know what is stored, or
+/// it would switch off a service that is just down.
 struct StoredSwitches {
     bool ftp = false;
     bool ftps = false;
@@ -31,7 +31,7 @@ std::optional<StoredSwitches> readStoredSwitches() {
                           (ftp.service_flags & VELT_FTP_SERVICE_TLS) != 0, sftp.enable != 0};
 }
 
-/// Where a service's module tells of it, and what the platform calls its daemon.
+/// Which row tells about a service, and how the platform names its daemon.
 struct Place {
     const char* name;
     const char* api;
@@ -47,7 +47,7 @@ constexpr std::array<Place, 3> places{{
     {"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, "enable", "sftp", &StoredSwitches::sftp},
 }};
 
-/// The answer of the row's "get", null when it has none.
+/// The row's answer; null when it fails.
 Json::Value settingsOf(const Row& row, const Principal& principal) {
     const Outcome outcome = callRow(row, Json::Value(Json::objectValue), principal.actor, principal.address);
     const bool good = outcome.kind == Outcome::Kind::success && outcome.data.isObject();
@@ -67,7 +67,7 @@ Service describe(const Place& place, const Json::Value& settings, const std::opt
     }
     const auto found = std::find_if(
         down.begin(), down.end(), [&place](const ServiceDown& each) { return each.service == place.daemon; });
-    // Of two services with one daemon, the one that is off is not missed.
+    // FTP and FTPS share a daemon; the one that is off is not down.
     if (found != down.end() && service.wanted.value_or(true)) {
         service.running = found->servesFormerSettings;
         service.reason = found->reason;

@@ -1,4 +1,4 @@
-// The services that the modules administer: which are switched on, and which run.
+// The services: which are switched on, and which run.
 #ifndef VELT_HOST_API_SERVICE_STATUS_H
 #define VELT_HOST_API_SERVICE_STATUS_H
 
@@ -16,17 +16,17 @@ namespace velt::host {
 
 struct Service {
     std::string name;           ///< "ftp", "ftps", "sftp"
-    Json::Value enabled;        ///< as the module tells it; null when it cannot tell
-    Json::Value port;           ///< the same
-    std::optional<bool> wanted; ///< whether the stored settings ask for it, when they can be read
+    Json::Value enabled;        ///< by the module's answer; null when it has none
+    Json::Value port;           ///< likewise
+    std::optional<bool> wanted; ///< by the stored settings; empty when they cannot be read
     bool running = false;
-    std::string reason; ///< a sentence why it does not run as the settings say; "" when it does
+    std::string reason; ///< why it does not run as the settings say, one sentence; "" when it does
 };
 
-/// Those whose module is loaded. To be called as a read.
+/// The services whose module is loaded. Call it as a read.
 std::vector<Service> listServices(const ModuleTable& table, const Principal& principal);
 
-/// "The FTP service does not run. The FTP daemon does not start: ...", of all; "" of none.
+/// "The FTP service does not run. The FTP daemon does not start: ...", for all of them; "" for none.
 std::string sentenceOf(const std::vector<ServiceDown>& down);
 
 Json::Value toObject(const Service& service);

@@ -43,7 +43,7 @@ std::vector<Route> statusRoutes(const ModuleTable& table) {
          false,
          Kind::read,
          [&table, start = Clock::now()](const Call& call) { return status(table, start, call); }},
-        // Not ordered: a change that takes long must not look like a host that hangs.
+        // Unordered: a long change must not make the host look hung.
         {"GET", {"healthz"}, false, Kind::unordered, [](const Call&) { return health(); }},
     };
 }

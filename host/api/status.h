@@ -1,4 +1,4 @@
-// /api/status and /healthz: how the services are.
+// /api/status and /healthz: the state of the host and its services.
 #ifndef VELT_HOST_API_STATUS_H
 #define VELT_HOST_API_STATUS_H
 
@@ -9,7 +9,7 @@
 
 namespace velt::host {
 
-/// The time since now is the host's up-time. The table outlives the routes.
+/// Counts the up-time from now on. The table outlives the routes.
 std::vector<Route> statusRoutes(const ModuleTable& table);
 
 } // namespace velt::host

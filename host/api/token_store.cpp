@@ -1,19 +1,14 @@
 #include "host/api/token_store.h"
 
+#include "base/file.h"
 #include "base/sha256.h"
 #include "host/base/clock.h"
-#include "host/base/file_text.h"
 #include "host/base/json.h"
 #include "host/base/random_text.h"
 
-#include <fcntl.h>
 #include <openssl/crypto.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
-#include <cerrno>
-#include <system_error>
 #include <utility>
 
 namespace velt::host {
@@ -44,36 +39,6 @@ std::optional<Token> fromObject(const Json::Value& object) {
                  object["sha256"].asString()};
 }
 
-std::string systemError() {
-    return std::generic_category().message(errno);
-}
-
-/// Writes the file whole and makes it durable; false, with errno, on failure.
-bool writeDurably(const std::filesystem::path& file, const std::string& text) {
-    const int descriptor = ::open(file.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, 0600);
-    if (descriptor < 0) {
-        return false;
-    }
-    std::size_t written = 0;
-    bool good = true;
-    while (good && written < text.size()) {
-        const ssize_t count = ::write(descriptor, text.data() + written, text.size() - written);
-        good = count > 0 || (count < 0 && errno == EINTR);
-        written += count > 0 ? static_cast<std::size_t>(count) : 0;
-    }
-    good = good && ::fsync(descriptor) == 0;
-    return ::close(descriptor) == 0 && good;
-}
-
-bool syncFolder(const std::filesystem::path& folder) {
-    const int descriptor = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    const bool good = descriptor >= 0 && ::fsync(descriptor) == 0;
-    if (descriptor >= 0) {
-        ::close(descriptor);
-    }
-    return good;
-}
-
 } // namespace
 
 Json::Value toObject(const Token& token) {
@@ -101,14 +66,14 @@ TokenStore::TokenStore(std::filesystem::path file) : file_(std::move(file)) {
 }
 
 void TokenStore::read() {
-    const auto text = readFileText(file_);
+    const auto text = readOptionalFile(file_);
     if (!text) {
-        if (errno == ENOENT) {
-            return;
-        }
-        throw TokenError("The file of tokens " + file_.string() + " cannot be read: " + systemError() + ".");
+        throw TokenError(text.error().message);
     }
-    const auto content = parseObject(*text);
+    if (!*text) {
+        return;
+    }
+    const auto content = parseObject(**text);
     const Json::Value list = content ? (*content)["tokens"] : Json::Value();
     bool good = list.isArray();
     for (Json::ArrayIndex i = 0; good && i < list.size(); ++i) {
@@ -119,7 +84,7 @@ void TokenStore::read() {
         }
     }
     if (!good) {
-        throw TokenError("The file of tokens " + file_.string() +
+        throw TokenError("The token file " + file_.string() +
                          " is damaged. Restore it, or remove it and make new tokens.");
     }
 }
@@ -130,15 +95,8 @@ void TokenStore::store(const std::vector<Token>& tokens) const {
     for (const Token& token : tokens) {
         root["tokens"].append(toStored(token));
     }
-    std::error_code folderError;
-    const std::filesystem::path folder = file_.parent_path();
-    std::filesystem::create_directories(folder, folderError);
-    const std::filesystem::path fresh = file_.string() + ".new";
-    errno = folderError.value();
-    if (folderError || !writeDurably(fresh, toJson(root) + "\n") ||
-        ::rename(fresh.c_str(), file_.c_str()) != 0 || !syncFolder(folder)) {
-        throw TokenError("The file of tokens " + file_.string() + " cannot be written: " + systemError() +
-                         ".");
+    if (const auto stored = replaceFile(file_, toJson(root) + "\n", 0600); !stored) {
+        throw TokenError(stored.error().message);
     }
 }
 

@@ -1,4 +1,4 @@
-// Bearer tokens. Only their hashes are stored: who reads the file cannot use it.
+// Bearer tokens. Only their hashes are stored, so the file is of no value to a thief.
 #ifndef VELT_HOST_API_TOKEN_STORE_H
 #define VELT_HOST_API_TOKEN_STORE_H
 
@@ -15,7 +15,7 @@
 
 namespace velt::host {
 
-/// The file of tokens cannot be read or written; what() is a sentence for the administrator.
+/// The token file cannot be read or written; what() is a sentence for the administrator.
 class TokenError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
@@ -34,17 +34,16 @@ Json::Value toObject(const Token& token);
 
 struct NewToken {
     Token stored;
-    std::string text; ///< what its owner shows; never seen again
+    std::string text; ///< what its owner sends; not kept anywhere
 };
 
 /// Thread-safe.
 class TokenStore {
 public:
-    /// Reads the file; there need be none yet. Throws TokenError when it is damaged: access is never guessed.
+    /// Reads the file, which may be missing. Throws TokenError when it is damaged: access is never guessed.
     explicit TokenStore(std::filesystem::path file);
 
-    /// Makes a token with 256 random bits. Throws TokenError when it cannot be stored; there is no new token
-    /// then.
+    /// Makes a token of 256 random bits. Throws TokenError, and makes none, when it cannot be stored.
     NewToken create(const std::string& name, Role role);
 
     /// False when there is no such token. Throws TokenError when the change cannot be stored.
@@ -52,7 +51,7 @@ public:
 
     std::vector<Token> tokens() const;
 
-    /// Whose token this is.
+    /// The token with this text.
     std::optional<Token> find(const std::string& token) const;
 
 private:
@@ -67,7 +66,7 @@ private:
 /// "admin" or "viewer".
 const char* roleName(Role role);
 
-/// Nothing for another word.
+/// Nothing for any other word.
 std::optional<Role> roleNamed(const std::string& name);
 
 } // namespace velt::host

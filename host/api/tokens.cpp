@@ -12,7 +12,7 @@ namespace {
 constexpr std::size_t maxName = 64;
 constexpr const char* noneMade = " No token was made.";
 
-/// A name that can stand in logs: not empty, no control characters.
+/// A name that is safe in logs: not empty, without control characters.
 bool isName(const Json::Value& value) {
     const std::string name = value.isString() ? value.asString() : "";
     return !name.empty() && name.size() <= maxName && std::all_of(name.begin(), name.end(), [](char c) {

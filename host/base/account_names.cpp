@@ -13,8 +13,7 @@ namespace {
 constexpr std::size_t firstSize = 4096;
 constexpr std::size_t largestSize = std::size_t{1} << 24U;
 
-/// Calls a look-up with a larger and larger buffer until its record fits: that of a group holds all of its
-/// members.
+/// Repeats a look-up with a larger buffer until the record fits; that of a group lists all members.
 template<class LookUp> int withRoom(std::vector<char>& buffer, const LookUp& lookUp) {
     buffer.resize(firstSize);
     int error = lookUp();
@@ -34,6 +33,15 @@ std::string userName(uid_t uid) {
     const int error =
         withRoom(buffer, [&] { return getpwuid_r(uid, &record, buffer.data(), buffer.size(), &found); });
     return error == 0 && found != nullptr ? found->pw_name : "uid " + std::to_string(uid);
+}
+
+std::string groupName(gid_t gid) {
+    std::vector<char> buffer;
+    group record{};
+    group* found = nullptr;
+    const int error =
+        withRoom(buffer, [&] { return getgrgid_r(gid, &record, buffer.data(), buffer.size(), &found); });
+    return error == 0 && found != nullptr ? found->gr_name : "gid " + std::to_string(gid);
 }
 
 std::optional<gid_t> groupNamed(const std::string& name) {

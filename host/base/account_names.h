@@ -1,4 +1,4 @@
-// Users and groups of this machine by their numbers and names.
+// Names and numbers of this machine's users and groups.
 #ifndef VELT_HOST_BASE_ACCOUNT_NAMES_H
 #define VELT_HOST_BASE_ACCOUNT_NAMES_H
 
@@ -11,6 +11,9 @@ namespace velt::host {
 
 /// "uid 1234" when the number has no name.
 std::string userName(uid_t uid);
+
+/// "gid 1234" when the number has no name.
+std::string groupName(gid_t gid);
 
 /// Nothing when there is no such group.
 std::optional<gid_t> groupNamed(const std::string& name);

@@ -19,7 +19,7 @@ std::tm brokenDown(TimePoint time) {
     return parts;
 }
 
-/// ".5Z" is 500 ms; nothing when it is neither empty, "Z", nor decimals before a "Z".
+/// 500 ms for ".5Z". Accepts "", "Z", and decimals with or without "Z".
 std::optional<milliseconds> parseFraction(std::string_view text) {
     int count = 0;
     if (text.starts_with('.')) {

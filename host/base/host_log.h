@@ -1,4 +1,4 @@
-// The host's own log: one line per event, to standard error, or to where a test wants it.
+// The host's own log: one line per event, to standard error unless a test redirects it.
 #ifndef VELT_HOST_BASE_HOST_LOG_H
 #define VELT_HOST_BASE_HOST_LOG_H
 
@@ -14,14 +14,14 @@ class HostLog {
 public:
     using Sink = std::function<void(const std::string& line)>;
 
-    /// Writes to standard error, each line beginning with the time.
+    /// Writes to standard error; each line begins with the time.
     HostLog();
     explicit HostLog(Sink sink);
 
-    /// Writes a line; what is not printable in `text` is escaped, so that nobody can write a line of his own.
+    /// Writes a line. Escapes what is not printable, so that nobody can forge a line.
     void write(std::string_view text);
 
-    /// The same, under the id of the request that it belongs to.
+    /// The same, under a request's id.
     void write(std::string_view requestId, std::string_view text);
 
 private:

@@ -38,7 +38,7 @@ std::string positionOf(std::string_view text, std::size_t offset) {
     return "line " + std::to_string(lines + 1) + ", column " + std::to_string(offset - lineStart + 1);
 }
 
-/// "* Line 1, Column 5\n  Syntax error...\n" becomes "line 1, column 5: Syntax error...".
+/// Turns "* Line 1, Column 5\n  Syntax error...\n" into "line 1, column 5: Syntax error...".
 std::string firstError(const std::string& errors) {
     std::istringstream lines(errors);
     std::string where;
@@ -89,12 +89,12 @@ Result<Json::Value> parseObject(std::string_view text) {
     if (const std::size_t invalid = findInvalidUtf8(text); invalid != std::string_view::npos) {
         return Error(positionOf(text, invalid) + ": the text is not UTF-8");
     }
-    // The library throws when the nesting is too deep.
+    // The library throws when values are nested too deeply.
     try {
         return parseText(text);
     } catch (const std::exception&) {
-        return Error("line 1, column 1: the values are nested more than " + std::to_string(maxNesting) +
-                     " deep");
+        return Error("line 1, column 1: values are nested more than " + std::to_string(maxNesting) +
+                     " levels deep");
     }
 }
 

@@ -1,5 +1,4 @@
-// JSON as text: what arrives in bodies and leaves in answers. Thread-safe; each thread has its own reader and
-// writer.
+// JSON as text. Thread-safe: each thread has its own reader and writer.
 #ifndef VELT_HOST_BASE_JSON_H
 #define VELT_HOST_BASE_JSON_H
 

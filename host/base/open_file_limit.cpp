@@ -8,8 +8,7 @@ namespace velt::host {
 
 namespace {
 
-// Listening sockets, connections that are told that there are too many, files of the modules and the
-// platform.
+// Listening sockets, connections that get a 503, files of the modules and the platform.
 constexpr std::size_t others = 256;
 
 } // namespace

@@ -1,4 +1,4 @@
-// How many descriptors this process may have open.
+// How many files this process may have open.
 #ifndef VELT_HOST_BASE_OPEN_FILE_LIMIT_H
 #define VELT_HOST_BASE_OPEN_FILE_LIMIT_H
 
@@ -6,8 +6,8 @@
 
 namespace velt::host {
 
-/// Raises the soft limit so that this many connections fit beside what the host and its modules open
-/// otherwise; never lowers it. Returns how many connections fit.
+/// Raises the soft limit, never lowers it, so that this many connections fit in besides what the host and its
+/// modules open. Returns how many do.
 std::size_t makeRoomForConnections(std::size_t connections);
 
 } // namespace velt::host

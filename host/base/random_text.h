@@ -1,4 +1,4 @@
-// Texts that nobody can guess.
+// Unguessable texts.
 #ifndef VELT_HOST_BASE_RANDOM_TEXT_H
 #define VELT_HOST_BASE_RANDOM_TEXT_H
 
@@ -7,10 +7,10 @@
 
 namespace velt::host {
 
-/// That many bytes from the kernel's generator, in hexadecimal. Throws std::system_error when it gives none.
+/// Random bytes of the kernel in hexadecimal. Throws std::system_error.
 std::string randomHexadecimal(std::size_t bytes);
 
-/// Names one request, uniquely among those of all runs of the host.
+/// A new id, unique among all runs of the host.
 std::string nextRequestId();
 
 } // namespace velt::host

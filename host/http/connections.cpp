@@ -17,7 +17,7 @@ std::uint64_t nowInMilliseconds() {
 
 void Connection::enter(State state, std::chrono::milliseconds time) {
     moment_ = moment(state, nowInMilliseconds() + static_cast<std::uint64_t>(time.count()));
-    // A connection that stopped being used while the host was ending the unused ones.
+    // It became idle while the host was ending the idle ones.
     if (ending_ && state == State::idle) {
         shutdown(descriptor(), SHUT_RD);
     }
@@ -30,13 +30,13 @@ void Connection::enterWithoutDeadline(State state) {
 void Connection::enforceDeadline() {
     Moment seen = moment_;
     const State state = stateOf(seen);
-    // The deadline is used up; when the connection has moved on meanwhile, it has another one.
+    // Unless the connection has moved on and has another deadline.
     if (nowInMilliseconds() <= seen >> stateBits ||
         !moment_.compare_exchange_strong(seen, moment(state, never))) {
         return;
     }
     if (state == State::idle || state == State::head || state == State::body) {
-        // The reader wakes up, and answers if it has to. A request that was complete a moment ago is still
+        // The reader wakes up, and answers if it must. A request that has just become complete is still
         // answered.
         tooSlow_ = state != State::idle;
         shutdown(descriptor(), SHUT_RD);
@@ -71,7 +71,7 @@ void Connections::add(const std::shared_ptr<Connection>& connection) {
 }
 
 template<class Action> void Connections::forEach(const Action& action) {
-    // A connection may end here, by the last pointer to it: not under the lock.
+    // Not under the lock: this may be the last pointer to a connection.
     std::vector<std::shared_ptr<Connection>> open;
     {
         const std::lock_guard lock(mutex_);

@@ -1,4 +1,4 @@
-// The open connections: counted, and looked at for their deadlines.
+// The open connections and their deadlines.
 #ifndef VELT_HOST_HTTP_CONNECTIONS_H
 #define VELT_HOST_HTTP_CONNECTIONS_H
 
@@ -12,18 +12,17 @@
 
 namespace velt::host {
 
-/// One connection. It closes its descriptor in its destructor only, so that others may shut it down
-/// meanwhile.
+/// One connection. Only its destructor closes the descriptor, so other threads may shut it down.
 class Connection {
 public:
     enum class State {
         idle,    ///< between requests
-        head,    ///< part of a head is there
-        body,    ///< part of a body is there
-        working, ///< the request is being served, or its refusal waits: no deadline
+        head,    ///< part of a head has arrived
+        body,    ///< part of a body has arrived
+        working, ///< the request is being served, or its refusal is delayed: no deadline
         writing,
         events,   ///< a stream of events
-        draining, ///< the answer is out, what the client still sends is thrown away
+        draining, ///< the answer is sent; what the client still sends is discarded
     };
 
     Connection() = default;
@@ -31,14 +30,14 @@ public:
     Connection(const Connection&) = delete;
     Connection& operator=(const Connection&) = delete;
 
-    /// Shuts the connection down when its deadline has passed. Who was slow with a request can still be told.
+    /// Shuts the connection down when its deadline has passed. A slow request still gets an answer.
     void enforceDeadline();
 
-    /// The host stops: ends the connection at once when nobody waits for an answer on it.
+    /// The host is stopping: ends the connection at once unless a request on it is being served.
     void endWhenUnused();
 
-    /// Ends a connection that takes another's place: one that waits for its client, and on which no request
-    /// has been granted access yet. False for others, and for one that ends so already.
+    /// Ends the connection to make room for another, if it is waiting for its client and no request on it was
+    /// granted access. False otherwise, or if it is already ending that way.
     bool giveWay();
 
 protected:
@@ -49,20 +48,19 @@ protected:
     /// A request on this connection was granted access.
     void trust() { trusted_ = true; }
 
-    /// This connection is one beyond those that have a place, so it has none to give.
+    /// This connection is beyond the limit, so ending it makes no room.
     void takeNoPlace() { givesWay_ = true; }
 
     /// Whether the client was too slow with its request.
     bool tooSlow() const { return tooSlow_; }
 
-    /// Whether the host stops, so that this request is the connection's last.
+    /// Whether the host is stopping, so that this request is the connection's last.
     bool ending() const { return ending_; }
 
     virtual int descriptor() = 0;
 
 private:
-    // State and deadline change together: who finds that a deadline has passed must not act on the state that
-    // came after it.
+    // State and deadline change together: a deadline that has passed must not end the state that followed.
     using Moment = std::uint64_t;
     static constexpr unsigned stateBits = 3;
     static constexpr std::uint64_t never = UINT64_MAX >> stateBits;
@@ -86,10 +84,10 @@ public:
     void enforceDeadlines();
     void endUnused();
 
-    /// Lets the oldest connection that can give way to a new one. False when none can.
+    /// Ends the oldest connection that can give way. False when none can.
     bool makeRoom();
 
-    /// Those that are open now.
+    /// How many are open now.
     std::size_t count();
 
 private:

@@ -1,4 +1,4 @@
-// A connection that has become a stream of events.
+// A connection that serves the stream of events.
 #ifndef VELT_HOST_HTTP_EVENT_STREAM_H
 #define VELT_HOST_HTTP_EVENT_STREAM_H
 
@@ -13,7 +13,7 @@
 
 namespace velt::host {
 
-/// Events come from any thread and reading goes on beside writing, so all of it runs on a strand.
+/// Events come from any thread, and it reads and writes at the same time, so everything runs on a strand.
 template<class Stream>
 class EventStream final : public EventReader, public std::enable_shared_from_this<EventStream<Stream>> {
 public:
@@ -24,14 +24,14 @@ public:
     static void start(const std::shared_ptr<Session<Stream>>& session) {
         const auto stream = std::make_shared<EventStream>(session);
         session->enterWithoutDeadline(Connection::State::events);
-        // What a slow reader has not taken shall wait here, where it is counted, and not in the kernel.
+        // What a slow reader has not taken waits here, where it is counted, and not in the kernel.
         const int size = 16 * 1024;
         setsockopt(session->descriptor(), SOL_SOCKET, SO_SNDBUF, &size, sizeof size);
         boost::asio::post(stream->strand_, [stream] {
             stream->push(std::make_shared<const std::string>(eventStreamHead()));
             stream->waitForEnd();
             stream->beat();
-            // From here on events may come in: the head is before them.
+            // After the head, so that it is sent before any event.
             stream->session_->handler_.addEventReader(stream);
         });
     }
@@ -77,7 +77,7 @@ private:
                                  }));
     }
 
-    /// A client has nothing to say here: that it left shows as the end of its data.
+    /// The client has nothing more to send; the end of its data means that it left.
     void waitForEnd() {
         session_->stream_.async_read_some(
             boost::asio::buffer(session_->discarded_),

@@ -45,7 +45,7 @@ bool isLoopback(const sockaddr* name, socklen_t size) {
     return name->sa_family == AF_INET6 && IN6_IS_ADDR_LOOPBACK(&address.sin6_addr) != 0;
 }
 
-/// Throws for an address that other machines reach, unless these are allowed.
+/// Throws for an address that other machines can reach, unless that is allowed.
 void checkReach(const std::string& address, const sockaddr* name, socklen_t size, bool allowRemote) {
     if (!allowRemote && !isLoopback(name, size)) {
         throw ListenError(address +
@@ -54,11 +54,11 @@ void checkReach(const std::string& address, const sockaddr* name, socklen_t size
     }
 }
 
-/// "[::1]:80" in its host and its port.
+/// Splits "[::1]:80" into "::1" and "80".
 std::pair<std::string, std::string> split(const std::string& address) {
     const std::size_t colon = address.rfind(':');
     if (colon == std::string::npos || colon + 1 == address.size()) {
-        throw ListenError("\"" + address + "\" is no address with a port, such as 127.0.0.1:8080.");
+        throw ListenError("\"" + address + "\" is not an address with a port, such as 127.0.0.1:8080.");
     }
     std::string host = address.substr(0, colon);
     if (host.starts_with('[') && host.ends_with(']')) {
@@ -74,7 +74,7 @@ struct SocketName {
 
 using NameGetter = int (*)(int, sockaddr*, socklen_t*);
 
-/// Of one end of a socket; family AF_UNSPEC when it has none.
+/// The name of one end of a socket; its family is AF_UNSPEC when it has none.
 SocketName socketName(int descriptor, NameGetter get) {
     SocketName name;
     void* const raw = &name.address;
@@ -103,7 +103,7 @@ std::pair<std::string, unsigned short> nameOf(int descriptor, NameGetter get) {
     return {text.data(), ntohs(address.sin6_port)};
 }
 
-/// An option of a socket, 0 when it cannot be had: no address family, and "no".
+/// An integer option of a socket; 0 on failure.
 int optionOf(int descriptor, int option) {
     int value = 0;
     socklen_t size = sizeof value;
@@ -139,10 +139,10 @@ void removeStale(const std::filesystem::path& path, const sockaddr_un& address) 
         return;
     }
     if (!S_ISSOCK(status.st_mode)) {
-        throw ListenError(path.string() + " is there already and is no socket.");
+        throw ListenError(path.string() + " exists and is not a socket.");
     }
     if (answers(address)) {
-        throw ListenError("Another program listens on " + path.string() + " already.");
+        throw ListenError("Another program already listens on " + path.string() + ".");
     }
     unlink(path.c_str());
 }
@@ -150,9 +150,9 @@ void removeStale(const std::filesystem::path& path, const sockaddr_un& address) 
 void giveToGroup(const std::filesystem::path& path, const std::string& name) {
     const auto group = groupNamed(name);
     const bool given = !group || lchown(path.c_str(), static_cast<uid_t>(-1), *group) == 0;
-    // A user who is not in the group cannot give it anything, and runs a host of his own, for himself.
+    // A user outside the group cannot give it the socket. Such a user runs a host for personal use.
     if (!given && (errno != EPERM || geteuid() == 0)) {
-        throw ListenError("The group " + name + " cannot be given " + path.string() + ": " + systemError() +
+        throw ListenError("Cannot give " + path.string() + " to the group " + name + ": " + systemError() +
                           ".");
     }
 }
@@ -201,7 +201,7 @@ Listener Listener::tcp(const std::string& address, bool allowRemote) {
     hints.ai_flags = AI_PASSIVE | AI_NUMERICSERV;
     addrinfo* list = nullptr;
     if (const int error = getaddrinfo(host.c_str(), port.c_str(), &hints, &list); error != 0) {
-        throw ListenError("\"" + address + "\" is no address to listen on: " + gai_strerror(error) + ".");
+        throw ListenError("Cannot listen on " + address + ": " + gai_strerror(error) + ".");
     }
     const std::unique_ptr<addrinfo, decltype(&freeaddrinfo)> owner(list, freeaddrinfo);
     checkReach(address, list->ai_addr, list->ai_addrlen, allowRemote);
@@ -222,7 +222,7 @@ Listener Listener::unixSocket(const std::filesystem::path& path, const std::stri
     const sockaddr_un address = unixAddress(path);
     removeStale(path, address);
     Listener listener(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0), AF_UNIX, {});
-    // Nobody may connect between the making of the socket and a later change of its mode.
+    // With the right mode from the start, nobody can connect too early.
     const mode_t former = umask(0117);
     const int bound = bind(listener.descriptor_, generic(&address), sizeof address);
     const int reason = errno;
@@ -250,8 +250,8 @@ std::vector<Listener> Listener::inherited(bool allowRemote) {
     const long descriptors = std::clamp(std::strtol(count, nullptr, 10), 0L, 64L);
     for (int descriptor = firstDescriptor; descriptor < firstDescriptor + descriptors; ++descriptor) {
         if (optionOf(descriptor, SO_ACCEPTCONN) == 0) {
-            throw ListenError("The descriptor " + std::to_string(descriptor) +
-                              " that was handed over is no listening socket.");
+            throw ListenError("The inherited descriptor " + std::to_string(descriptor) +
+                              " is not a listening socket.");
         }
         fcntl(descriptor, F_SETFD, FD_CLOEXEC);
         fcntl(descriptor, F_SETFL, fcntl(descriptor, F_GETFL) | O_NONBLOCK);

@@ -1,4 +1,4 @@
-// Listening sockets, made without the HTTP library.
+// Listening sockets. Needs no HTTP library.
 #ifndef VELT_HOST_HTTP_LISTENER_H
 #define VELT_HOST_HTTP_LISTENER_H
 
@@ -11,25 +11,25 @@
 
 namespace velt::host {
 
-/// A place cannot be listened on; what() is a sentence for the administrator.
+/// The host cannot listen somewhere; what() is a sentence for the administrator.
 class ListenError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
 };
 
-/// A listening descriptor, closed at the end; a Unix socket's path is unlinked then if it was made here.
+/// Owns a listening descriptor, and the path of a Unix socket that it made.
 class Listener {
 public:
-    /// An address such as "127.0.0.1:8080", "[::1]:0" or "localhost:8080"; port 0 takes a free one. Anything
-    /// but loopback is refused unless `allowRemote`. Throws ListenError.
+    /// Listens on an address such as "127.0.0.1:8080", "[::1]:0" or "localhost:8080"; port 0 takes a free
+    /// one. Addresses other than loopback need `allowRemote`. Throws ListenError.
     static Listener tcp(const std::string& address, bool allowRemote);
 
-    /// A Unix socket that its owner and the group (when there is such a group) can connect to. What a dead
-    /// host has left at the path is removed, a live one is not. Throws ListenError.
+    /// Listens on a Unix socket that its owner and the group (if it exists) can connect to. Replaces the
+    /// socket of a dead host, not that of a live one. Throws ListenError.
     static Listener unixSocket(const std::filesystem::path& path, const std::string& group);
 
-    /// What the service manager hands over when it started this process by socket activation; usually none.
-    /// The rule of tcp() holds for these as well. Throws ListenError.
+    /// The sockets that the service manager passed by socket activation, usually none. `allowRemote` is as
+    /// for tcp(). Throws ListenError.
     static std::vector<Listener> inherited(bool allowRemote);
 
     Listener(Listener&& other) noexcept;
@@ -51,10 +51,10 @@ private:
 
     int descriptor_;
     int family_;
-    std::filesystem::path path_; ///< to unlink at the end
+    std::filesystem::path path_; ///< to unlink in the destructor; "" for none
 };
 
-/// What the kernel tells about a connected socket.
+/// What the kernel knows about a connected socket.
 Peer peerOf(int descriptor, bool isTls);
 
 } // namespace velt::host

@@ -1,4 +1,4 @@
-// Requests and answers as the rest of the host sees them: no sockets, no parser.
+// Requests and answers, without sockets and parsers.
 #ifndef VELT_HOST_HTTP_MESSAGE_H
 #define VELT_HOST_HTTP_MESSAGE_H
 
@@ -13,7 +13,7 @@
 
 namespace velt::host {
 
-/// Who is at the other end of a connection, as the kernel says.
+/// The other end of a connection, as the kernel knows it.
 struct Peer {
     bool isUnixSocket = false;
     bool isTls = false;
@@ -24,7 +24,7 @@ struct Peer {
     std::vector<gid_t> groups;          ///< of a Unix socket's peer
 };
 
-/// A request, its body complete unless only the head is looked at.
+/// A request. While only its head has been read, the body is empty.
 struct HttpRequest {
     std::string method;
     std::string target; ///< path and query, as sent
@@ -34,7 +34,7 @@ struct HttpRequest {
     std::string authorization; ///< "" when there is none
     std::string ifMatch;       ///< "" when there is none
     std::string body;
-    bool wellFormed = true; ///< else the server refuses it as soon as access is granted
+    bool wellFormed = true; ///< if false, the server refuses it once access is granted
 
     /// The target without query, and the query without "?".
     std::string path() const { return target.substr(0, target.find('?')); }
@@ -63,13 +63,13 @@ struct Principal {
     std::string address;
 };
 
-/// A request that gets no further than its head.
+/// The answer to a request that is refused by its head.
 struct Refusal {
     HttpResponse response;
-    bool delayed = false; ///< a failed attempt: the answer waits
+    bool delayed = false; ///< a failed attempt: the answer is delayed
 };
 
-/// The reader of a stream of events.
+/// A client that reads the stream of events.
 class EventReader {
 public:
     EventReader() = default;
@@ -77,11 +77,12 @@ public:
     EventReader(const EventReader&) = delete;
     EventReader& operator=(const EventReader&) = delete;
 
-    /// Hands on one event, ready to be sent. Any thread; must not block.
+    /// Sends one event, which is complete. From any thread; does not block.
     virtual void deliver(const std::shared_ptr<const std::string>& event) = 0;
 };
 
-/// What the HTTP server asks of the rest of the host. Called by several threads at once.
+/// What the server asks of the application, which lies on a floor above and is not known here. Called by
+/// several threads at once.
 class HttpHandler {
 public:
     using Done = std::function<void(HttpResponse)>;
@@ -91,7 +92,7 @@ public:
     HttpHandler(const HttpHandler&) = delete;
     HttpHandler& operator=(const HttpHandler&) = delete;
 
-    /// Looks at a request's head. Grants access by filling `principal`, or refuses the request.
+    /// Checks a request's head. Grants access by filling `principal`, or refuses the request.
     virtual std::optional<Refusal> checkAccess(const HttpRequest& head, const Peer& peer,
                                                Principal& principal) = 0;
 
@@ -101,7 +102,7 @@ public:
     /// Answers a request by calling `done` once, now or later, on any thread. Must not block.
     virtual void handle(HttpRequest request, const Principal& principal, Done done) = 0;
 
-    /// An answer that the server gives by itself: a malformed or oversized request, an overload.
+    /// The answer to what the server refuses by itself: a malformed or oversized request, an overload.
     virtual HttpResponse failure(int status, const std::string& detail) = 0;
 
     virtual void addEventReader(const std::shared_ptr<EventReader>& reader) = 0;

@@ -36,7 +36,7 @@ void RequestReader::reset() {
     auto& parser = parser_->http.emplace();
     parser.eager(true);
     parser.body_limit(bodyLimit_);
-    // The reader itself holds the limit, since it hands over heads whole.
+    // Not the limit itself, which the reader enforces: it hands over whole heads.
     parser.header_limit(static_cast<std::uint32_t>(headLimit_ + firstBufferSize));
     headDone_ = false;
     keepAlive_ = false;
@@ -81,7 +81,7 @@ RequestReader::Step RequestReader::next() {
 }
 
 RequestReader::Step RequestReader::readHead() {
-    // An empty line before a request is let pass, as the protocol asks for.
+    // Empty lines before a request are ignored, as the protocol asks.
     while (scanned_ == 0 && end_ - begin_ >= 2 && buffer_[begin_] == '\r' && buffer_[begin_ + 1] == '\n') {
         begin_ += 2;
     }
@@ -95,23 +95,23 @@ RequestReader::Step RequestReader::readHead() {
         }
         const auto lineEnd = static_cast<std::size_t>(static_cast<const char*>(found) - head);
         if (lineEnd == 0 || head[lineEnd - 1] != '\r') {
-            return refuse(400, "A line of the head does not end in CR LF.");
+            return refuse(400, "A header line does not end in CR LF.");
         }
         if (lineEnd >= 3 && head[lineEnd - 2] == '\n') {
-            return lineEnd < headLimit_ ? checkHead() : refuse(431, "The head of the request is too large.");
+            return lineEnd < headLimit_ ? checkHead() : refuse(431, "The request header is too large.");
         }
-        // A continued line reads differently to different programs.
+        // Programs disagree about what a continued line means.
         if (lineEnd + 1 < size && (head[lineEnd + 1] == ' ' || head[lineEnd + 1] == '\t')) {
-            return refuse(400, "A line of the head is continued on the next, which is obsolete.");
+            return refuse(400, "A header line continues on the next line, which is obsolete.");
         }
         if (lineEnd + 1 == size) {
-            // Whether the next line continues this one shows with its first byte.
+            // The first byte of the next line will tell whether it continues this one.
             scanned_ = lineEnd;
             break;
         }
         scanned_ = lineEnd + 1;
     }
-    return size >= headLimit_ ? refuse(431, "The head of the request is too large.") : Step::needMore;
+    return size >= headLimit_ ? refuse(431, "The request header is too large.") : Step::needMore;
 }
 
 RequestReader::Step RequestReader::checkHead() {
@@ -122,10 +122,10 @@ RequestReader::Step RequestReader::checkHead() {
     const bool tooLarge = error == http::error::body_limit;
     const bool malformed = error && error != http::error::need_more && !tooLarge;
     if (malformed && !parser.is_header_done()) {
-        return error == http::error::bad_version ? refuse(505, "Only HTTP/1.0 and HTTP/1.1 are spoken.")
-                                                 : refuse(400, "The request is no well-formed HTTP.");
+        return error == http::error::bad_version ? refuse(505, "Only HTTP/1.0 and HTTP/1.1 are supported.")
+                                                 : refuse(400, "The request is not well-formed HTTP.");
     }
-    // What else is wrong is told later: access is looked at first.
+    // Reported later: access is checked first.
     refusal_ = faultOfHead(tooLarge, malformed);
     fillRequest();
     return Step::head;
@@ -135,17 +135,17 @@ RequestReader::Refused RequestReader::faultOfHead(bool bodyTooLarge, bool bodyMa
     const auto& message = parser_->http->get();
     const auto hosts = message.count(http::field::host);
     if (hosts > 1 || (hosts == 0 && message.version() == 11)) {
-        return {400, "The head must hold exactly one Host."};
+        return {400, "The request must have exactly one Host header."};
     }
     const auto coding = message.find(http::field::transfer_encoding);
     if (coding != message.end() && !boost::beast::iequals(coding->value(), "chunked")) {
-        return {501, "The only transfer coding that is understood is chunked."};
+        return {501, "The only supported transfer coding is chunked."};
     }
     if (!message.target().starts_with('/')) {
-        return {400, "The request's target must begin with \"/\"."};
+        return {400, "The request target must begin with \"/\"."};
     }
     if (bodyMalformed) {
-        return {400, "The body is no well-formed HTTP."};
+        return {400, "The body is not well-formed HTTP."};
     }
     return bodyTooLarge ? tooLargeBody() : Refused{};
 }
@@ -158,7 +158,7 @@ void RequestReader::fillRequest() {
     request_.host = text(message[http::field::host]);
     request_.origin = text(message[http::field::origin]);
     request_.fetchSite = text(message["Sec-Fetch-Site"]);
-    // Two of them leave open which one counts, so neither does.
+    // With two of them it is open which one counts, so neither does.
     const bool one = message.count(http::field::authorization) <= 1;
     request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
     request_.ifMatch = text(message[http::field::if_match]);
@@ -181,10 +181,10 @@ RequestReader::Step RequestReader::readBody() {
             return Step::refused;
         }
         if (error && error != http::error::need_more) {
-            return refuse(400, "The body is no well-formed HTTP.");
+            return refuse(400, "The body is not well-formed HTTP.");
         }
         if (!parser.is_done() && end_ - begin_ == std::max(headLimit_, firstBufferSize)) {
-            return refuse(400, "A chunk of the body has too long a head.");
+            return refuse(400, "The header of a chunk is too long.");
         }
     }
     if (!parser.is_done()) {

@@ -1,4 +1,4 @@
-// Takes requests out of the bytes of a connection.
+// Reads requests from the bytes of a connection.
 #ifndef VELT_HOST_HTTP_REQUEST_READER_H
 #define VELT_HOST_HTTP_REQUEST_READER_H
 
@@ -11,16 +11,16 @@
 
 namespace velt::host {
 
-/// The framing of one connection's requests, strict where leniency would let two readers disagree about where
-/// a request ends. Not thread-safe.
+/// Finds the requests of one connection. Strict wherever two readers could disagree about where a request
+/// ends. Not thread-safe.
 class RequestReader {
 public:
     enum class Step {
         needMore, ///< read more bytes
-        head,     ///< the head is there: look at it, then go on; comes once for each request, also for one
-                  ///< that is refused next if its head could be read
+        head,     ///< the head is complete: check it, then call next() again. Comes once for each request,
+                  ///< even if it is refused next, unless its head cannot be read
         request,  ///< the request is complete
-        refused,  ///< no request can be read any more: refusal() says why
+        refused,  ///< no more requests can be read; refusal() says why
     };
 
     struct Refused {
@@ -33,16 +33,16 @@ public:
     RequestReader(const RequestReader&) = delete;
     RequestReader& operator=(const RequestReader&) = delete;
 
-    /// Where the next bytes go, and how many fit: never none after needMore.
+    /// Where the next bytes go, and how many fit; at least one after needMore.
     std::pair<char*, std::size_t> space();
     void added(std::size_t bytes);
 
     Step next();
 
-    /// Whether a part of a request is there.
+    /// Whether part of a request has arrived.
     bool hasBegun() const;
 
-    /// The head's fields; with its body after `request`.
+    /// With its body only after Step::request.
     const HttpRequest& request() const { return request_; }
     HttpRequest takeRequest() { return std::move(request_); }
     bool keepAlive() const { return keepAlive_; }

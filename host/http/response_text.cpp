@@ -13,7 +13,7 @@ namespace {
 void addHeader(std::string& text, const std::string& name, const std::string& value) {
     text += name;
     text += ": ";
-    // A line end in a value would begin a header of its own.
+    // A line break in a value would begin another header.
     for (const char c : value) {
         text += static_cast<unsigned char>(c) < 0x20 ? ' ' : c;
     }

@@ -27,7 +27,7 @@ using Timer = asio::basic_waitable_timer<std::chrono::steady_clock,
                                          asio::wait_traits<std::chrono::steady_clock>, Executor>;
 
 constexpr std::chrono::milliseconds acceptPause{50};
-/// So many connections beyond the limit are told why they are not served.
+/// How many connections beyond the limit get a 503.
 constexpr std::size_t refusedConnections = 64;
 
 std::unique_ptr<asio::ssl::context> makeTlsContext(const TlsFiles& files) {
@@ -43,8 +43,8 @@ std::unique_ptr<asio::ssl::context> makeTlsContext(const TlsFiles& files) {
         context->use_private_key_file(files.key.string(), asio::ssl::context::pem, error);
     }
     if (error) {
-        throw ListenError("The TLS certificate " + files.certificate.string() + " with the key " +
-                          files.key.string() + " cannot be used: " + error.message() + ".");
+        throw ListenError("Cannot use the TLS certificate " + files.certificate.string() + " with the key " +
+                          files.key.string() + ": " + error.message() + ".");
     }
     return context;
 }
@@ -56,7 +56,7 @@ struct HttpServer::Core {
     struct Door {
         Door(asio::io_context& context, Listener socket)
             : listener(std::move(socket)), acceptor(context), peer(context), pause(context) {
-            // The acceptor closes its own descriptor, the listener closes the other.
+            // Both close their descriptor, so each has its own.
             acceptor.assign({listener.isUnixSocket() ? AF_UNIX : AF_INET, 0}, dup(listener.descriptor()));
         }
 
@@ -79,7 +79,7 @@ struct HttpServer::Core {
                 accept(door);
                 return;
             }
-            // Without descriptors the next attempt would fail at once, too.
+            // Out of descriptors: the next attempt would fail at once, too.
             door.pause.expires_after(acceptPause);
             door.pause.async_wait([this, &door](const Error&) {
                 if (!stopping) {
@@ -98,7 +98,7 @@ struct HttpServer::Core {
             setsockopt(socket.native_handle(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
         }
         const std::size_t open = connections.count();
-        // Who only connects must not keep those out who have something to ask.
+        // Idle strangers must not keep out those who have a request.
         if (open >= limits.connections && !connections.makeRoom()) {
             if (!isTls && open < limits.connections + refusedConnections) {
                 make<PlainStream>(std::move(socket), std::move(peer))->refuse();

@@ -17,16 +17,16 @@ struct HttpLimits {
     std::size_t head = std::size_t{16} * 1024; ///< bytes
     std::size_t body = std::size_t{1024} * 1024;
     std::size_t connections = 1000;
-    std::size_t delayedRefusals = 100; ///< that wait at one time; more failed attempts are answered at once
+    std::size_t delayedRefusals = 100; ///< waiting at one time; further failed attempts are answered at once
     std::size_t queuedEvents = std::size_t{256} * 1024; ///< bytes that a slow reader of events may lag behind
     std::chrono::milliseconds headTime{10'000};
     std::chrono::milliseconds bodyTime{30'000};
     std::chrono::milliseconds idleTime{30'000};
     std::chrono::milliseconds writeTime{20'000};
     std::chrono::milliseconds drainTime{2'000};
-    std::chrono::milliseconds refusalDelay{1'000}; ///< before the answer to a failed attempt
+    std::chrono::milliseconds refusalDelay{1'000}; ///< of the answer to a failed attempt
     std::chrono::milliseconds heartbeat{15'000};   ///< of a stream of events
-    std::chrono::milliseconds sweep{1'000};        ///< how often deadlines are looked at
+    std::chrono::milliseconds sweep{1'000};        ///< how often deadlines are checked
 };
 
 struct TlsFiles {
@@ -44,14 +44,13 @@ public:
     HttpServer(const HttpServer&) = delete;
     HttpServer& operator=(const HttpServer&) = delete;
 
-    /// To be called before start(). TCP listeners speak TLS when there is a certificate, Unix sockets never
-    /// do.
+    /// Call it before start(). TCP listeners use TLS if there is a certificate, Unix sockets never do.
     void add(Listener listener);
 
     void start(unsigned threads);
 
-    /// Accepts no more, ends idle connections and streams of events at once, and waits until the requests
-    /// that run are answered, or until the time is over.
+    /// Stops accepting, ends idle connections and streams of events at once, and waits up to `patience` until
+    /// the running requests are answered.
     void stop(std::chrono::milliseconds patience);
 
     std::size_t connections() const;

@@ -41,8 +41,8 @@ struct SessionShared {
     std::atomic<std::size_t> delayedRefusals{0};
 };
 
-/// One operation is in flight at a time, so a session needs no strand; it lives as long as an operation
-/// of it is pending.
+/// Only one operation is in flight at a time, so a session needs no strand. A pending operation keeps it
+/// alive.
 template<class Stream>
 class Session final : public Connection, public std::enable_shared_from_this<Session<Stream>> {
 public:
@@ -136,7 +136,7 @@ private:
         }
     }
 
-    /// False when the reading goes on elsewhere, or not at all.
+    /// False when reading goes on later, or not at all.
     bool acceptHead() {
         enter(State::body, limits_.bodyTime);
         if (auto refusal = handler_.checkAccess(reader_.request(), peer_, principal_)) {
@@ -159,7 +159,7 @@ private:
 
     void refuseAccess(Refusal refusal) {
         enterWithoutDeadline(State::working);
-        // Waiting refusals take connections: so many at once are no guesses but an attempt to use these up.
+        // Each delayed refusal holds a connection; beyond the limit they would use them up.
         if (!refusal.delayed || ++shared_.delayedRefusals > limits_.delayedRefusals) {
             shared_.delayedRefusals -= refusal.delayed ? 1U : 0U;
             respond(refusal.response, false);
@@ -209,8 +209,8 @@ private:
             });
     }
 
-    /// Ends the sending side, and throws away for a while what the client still sends: a reset would take the
-    /// answer from it.
+    /// Shuts down the sending side, and for a while discards what the client still sends: a reset could keep
+    /// it from reading the answer.
     void finish() {
         enter(State::draining, limits_.drainTime);
         if constexpr (isTls) {

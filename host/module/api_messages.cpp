@@ -16,7 +16,7 @@ void Response::answer(bool success, int code, const Json::Value& data) {
 
 } // namespace velt::host
 
-// Every request and response that a module sees is one of ours: nobody else makes them in this process.
+// Only this host makes the requests and responses of this process, so the casts below hold.
 namespace VELT {
 
 Json::Value APIRequest::GetParam(const std::string& name, const Json::Value& defaultValue) {

@@ -1,4 +1,4 @@
-// The framework's side of a request: what a module's entry function is called with.
+// The framework's side: the request and the response that an entry function is called with.
 #ifndef VELT_HOST_MODULE_API_MESSAGES_H
 #define VELT_HOST_MODULE_API_MESSAGES_H
 
@@ -20,7 +20,7 @@ private:
     Json::Value parameters_;
 };
 
-/// A response, which counts the answers that it is given and keeps the first.
+/// A response. Keeps the first answer, and counts them all.
 class Response final : public VELT::APIResponse {
 public:
     int answers() const { return answers_; }

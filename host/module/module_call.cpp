@@ -10,7 +10,7 @@ namespace velt::host {
 
 namespace {
 
-/// Runs the entry function; returns what it threw, in words, or "".
+/// Runs the entry function; returns what it threw, in words, or "" if it threw nothing.
 std::string run(const Row& row, Request& request, Response& response) {
     try {
         row.entry(&request, &response);
@@ -18,7 +18,7 @@ std::string run(const Row& row, Request& request, Response& response) {
     } catch (const std::exception& error) {
         return std::string("the entry function threw an exception: ") + error.what();
     } catch (...) {
-        return "the entry function threw something that is no exception";
+        return "the entry function threw something other than an exception";
     }
 }
 

@@ -1,4 +1,4 @@
-// One call of a module's entry function, and what came of it.
+// One call of a module's entry function, and its outcome.
 #ifndef VELT_HOST_MODULE_MODULE_CALL_H
 #define VELT_HOST_MODULE_MODULE_CALL_H
 
@@ -28,8 +28,7 @@ struct Outcome {
     double seconds = 0;
 };
 
-/// Calls the row's entry function on this thread, in the actor's name. Nothing that the module throws leaves
-/// it.
+/// Calls the row's entry function on this thread, on behalf of the actor. Catches whatever the module throws.
 Outcome callRow(const Row& row, const Json::Value& parameters, const std::string& actor,
                 const std::string& address);
 

@@ -7,7 +7,7 @@
 #include <cstdio>
 #include <exception>
 
-// <syslog.h> is not included: with fortification it defines syslog itself.
+// Not from <syslog.h>, which defines syslog itself when fortified.
 extern "C" {
 
 void syslog(int priority, const char* format, ...) __attribute__((format(printf, 2, 3)));
@@ -37,7 +37,7 @@ __attribute__((format(printf, 1, 0))) std::string rendered(const char* format, v
 }
 
 __attribute__((format(printf, 2, 0))) void write(int priority, const char* format, va_list arguments) {
-    // "%m" is the text of errno, in both copies of the line.
+    // "%m" stands for the text of errno, in both copies of the line.
     const int error = errno;
     if (current != nullptr) {
         va_list copy;
@@ -45,7 +45,7 @@ __attribute__((format(printf, 2, 0))) void write(int priority, const char* forma
         try {
             current->add(rendered(format, copy));
         } catch (const std::exception&) {
-            // Without memory the line is lost here, but it still reaches the system log.
+            // Out of memory: the line still reaches the system log.
         }
         va_end(copy);
     }

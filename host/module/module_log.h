@@ -1,7 +1,7 @@
 // What modules write to the system log while they serve a request.
 //
-// The process defines syslog itself: each line still goes to the system log, and is kept for the request that
-// the thread serves. The program that links this exports its symbols, so that loaded modules find them first.
+// The process defines syslog itself: each line goes to the system log, and is kept for the request that the
+// thread serves. The program that links this exports its symbols, so that loaded modules find them first.
 #ifndef VELT_HOST_MODULE_MODULE_LOG_H
 #define VELT_HOST_MODULE_MODULE_LOG_H
 
@@ -10,7 +10,7 @@
 
 namespace velt::host {
 
-/// Collects the lines of this thread while it lives. Belongs to the thread that made it; they may be nested.
+/// Collects the lines of the thread that made it, for its lifetime. They may be nested.
 class ModuleLog {
 public:
     ModuleLog();
@@ -28,8 +28,8 @@ private:
     ModuleLog* outer_;
 };
 
-/// The last line that says why, without the source and line number that it begins with: "Port conflict."; ""
-/// when there is none. The line that repeats the request's parameters says nothing new.
+/// The last line that gives a reason, without the source and line number in front: "Port conflict."; "" when
+/// there is none. The line that repeats the request's parameters gives none.
 std::string reasonIn(const std::vector<std::string>& lines);
 
 } // namespace velt::host

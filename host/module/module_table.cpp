@@ -45,21 +45,21 @@ ModuleTable::~ModuleTable() {
 }
 
 void ModuleTable::load(const std::filesystem::path& file) {
-    // With a slash, dlopen looks at this file and not along the library path.
+    // A name without a slash would make dlopen search the library path.
     const std::string path = std::filesystem::absolute(file).string();
     void* const module = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (module == nullptr) {
-        throw LoadError("The module cannot be loaded: " + lastLoaderError() + ".");
+        throw LoadError("Cannot load the module: " + lastLoaderError() + ".");
     }
     modules_.push_back(module);
     void* const symbol = dlsym(module, "GetAPITable");
     if (symbol == nullptr) {
-        throw LoadError("The module " + path + " is none: it does not export GetAPITable.");
+        throw LoadError(path + " is not a module: it does not export GetAPITable.");
     }
     const auto getTable = reinterpret_cast<GetAPITable>(symbol); // NOLINT(*-reinterpret-cast)
     const VELT::APITableRow* const table = getTable();
     if (table == nullptr) {
-        throw LoadError("The module " + path + " hands out no API table.");
+        throw LoadError("The module " + path + " returns no API table.");
     }
     addRows(table, path);
 }
@@ -67,8 +67,8 @@ void ModuleTable::load(const std::filesystem::path& file) {
 void ModuleTable::addRows(const VELT::APITableRow* table, const std::string& file) {
     for (const VELT::APITableRow* row = table; !isEnd(*row); ++row) {
         if (!isComplete(*row)) {
-            throw LoadError("The module " + file + " has an incomplete row in its API table, at position " +
-                            std::to_string(row - table + 1) + ".");
+            throw LoadError("Row " + std::to_string(row - table + 1) + " of the API table of " + file +
+                            " is incomplete.");
         }
         Entry entry{{row->api, row->version, row->method, row->entry}, file};
         const std::string name = entry.row.name();

@@ -1,4 +1,4 @@
-// The loaded modules and the rows that they serve.
+// The loaded modules and their rows.
 #ifndef VELT_HOST_MODULE_MODULE_TABLE_H
 #define VELT_HOST_MODULE_MODULE_TABLE_H
 
@@ -29,15 +29,14 @@ struct Row {
     /// Whether the method only reads: "get", "list", "load", and names that begin with "get_" or "list_".
     bool reads() const;
 
-    /// Whether a GET may call it: it reads, and takes no parameters. "list" takes some.
+    /// Whether GET may call it: it reads and needs no parameters ("list" does).
     bool callableByGet() const;
 
     /// "VELT.Core.FileServ.FTP v3 get"
     std::string name() const;
 };
 
-/// Filled at the start, then constant and safe to use from any thread. The modules stay loaded while it
-/// lives.
+/// Filled at the start, then constant and safe to use from any thread. Keeps the modules loaded.
 class ModuleTable {
 public:
     ModuleTable() = default;
@@ -45,7 +44,7 @@ public:
     ModuleTable(const ModuleTable&) = delete;
     ModuleTable& operator=(const ModuleTable&) = delete;
 
-    /// Loads a module and adds its rows. Throws LoadError, also when a row is there already.
+    /// Loads a module and adds its rows. Throws LoadError, also for a row that exists already.
     void load(const std::filesystem::path& file);
 
     /// Null when there is no such row.

@@ -40,7 +40,7 @@ void PlatformRequest::note(Effect effect, std::string_view subject, bool done) {
         }
         [[fallthrough]];
     case Effect::stop:
-        // A daemon whose start or stop failed half-way has changed, too.
+        // A start or stop that failed half-way has changed the daemon, too.
         report_.changed = true;
         break;
     default:

@@ -18,8 +18,7 @@ struct PlatformReport {
     PortConflict conflict;            ///< the port that was found taken
 };
 
-/// Tells the platform who makes the request that this thread serves, and takes notes, while it lives. Stays
-/// on its thread.
+/// The request that this thread serves, from its construction to finish(). Stays on its thread.
 class PlatformRequest {
 public:
     PlatformRequest(const std::string& actor, const std::string& address);
@@ -27,7 +26,7 @@ public:
     PlatformRequest(const PlatformRequest&) = delete;
     PlatformRequest& operator=(const PlatformRequest&) = delete;
 
-    /// Ends the request, and tells what it did. To be called once.
+    /// Ends the request and tells what it did. Call it once.
     PlatformReport finish();
 
 private:

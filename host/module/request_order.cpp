@@ -85,7 +85,7 @@ void RequestOrder::work(Pool& pool) {
         pool.queue.pop_front();
         started(next.kind);
         lock.unlock();
-        // The next in the queue may be a read that can run beside this one.
+        // The next one may be a read that can run at the same time.
         pool.changed.notify_one();
         next.task();
         next.task = nullptr;

@@ -1,5 +1,4 @@
-// The order in which requests reach the modules: reads side by side, writes alone, in the order of their
-// arrival.
+// The order in which requests reach the modules: in the order of arrival, reads side by side, writes alone.
 #ifndef VELT_HOST_MODULE_REQUEST_ORDER_H
 #define VELT_HOST_MODULE_REQUEST_ORDER_H
 
@@ -13,9 +12,9 @@
 
 namespace velt::host {
 
-/// Two pools of threads. No read runs while a write runs, and no two writes run at once; a read that comes
-/// after a waiting write waits for it too, so that writes do not starve. What needs no module has threads of
-/// its own: modules that block all of theirs do not delay it. No thread waits in a lock for another's turn.
+/// Two pools of threads. A write runs alone; a read that comes after a waiting write waits for it, so that
+/// writes do not starve. Requests that need no module have threads of their own, so modules that block do not
+/// delay them.
 class RequestOrder {
 public:
     enum class Kind {
@@ -27,19 +26,19 @@ public:
     /// Tasks must not throw.
     using Task = std::function<void()>;
 
-    /// With so many threads for reads and writes. Of each kind, ordered and unordered, as many as said may
+    /// `threads` are for reads and writes. Of each kind, ordered and unordered, at most `maxWaiting` may
     /// wait.
     RequestOrder(unsigned threads, std::size_t maxWaiting);
 
-    /// Stops as stop() does.
+    /// Calls stop().
     ~RequestOrder();
     RequestOrder(const RequestOrder&) = delete;
     RequestOrder& operator=(const RequestOrder&) = delete;
 
-    /// False when too many wait, or when stop() was called: the task is dropped then.
+    /// False when too many are waiting or stop() was called; the task is then dropped.
     bool submit(Kind kind, Task task);
 
-    /// Finishes what was submitted, then ends the threads. Later calls do nothing.
+    /// Finishes what was submitted, then ends the threads. May be called again.
     void stop();
 
 private:

@@ -190,11 +190,11 @@ TEST(Config, TheCommandLineGoesBeforeTheFile) {
 }
 
 TEST(Config, AnOptionThatIsWrongIsNamed) {
-    EXPECT_EQ(refusal({}), "Name at least one module to load: --module FILE.");
+    EXPECT_EQ(refusal({}), "No module is given: use --module FILE.");
     EXPECT_EQ(refusal({"--module"}), "--module needs a value.");
-    EXPECT_EQ(refusal({"--module="}), "--module takes a text that is not empty, not \"\".");
+    EXPECT_EQ(refusal({"--module="}), "--module takes a non-empty text, not \"\".");
     for (const char* word : {"module.so", "--nonsense", "--", "-module", "", "--max_body=1", "--Module=a"}) {
-        EXPECT_EQ(refusal({word}), "\"" + std::string(word) + "\" is no option. --help lists them.");
+        EXPECT_EQ(refusal({word}), "\"" + std::string(word) + "\" is not an option. --help lists them.");
     }
     EXPECT_EQ(refusal({"--allow-remote=yes"}), "--allow-remote takes no value.");
     EXPECT_EQ(refusal({"--help=x"}), "--help takes no value.");
@@ -208,24 +208,25 @@ TEST(Config, AnOptionThatIsWrongIsNamed) {
     EXPECT_EQ(refusal({"--stop-seconds=-1"}),
               "--stop-seconds takes a whole number from 0 to 86400, not \"-1\".");
     EXPECT_EQ(refusal({"--module", "a", "--tls-certificate", "c"}),
-              "A TLS certificate needs its key, and a key its certificate.");
+              "--tls-certificate and --tls-key must be given together.");
     EXPECT_EQ(refusal({"--module", "a", "--tls-key", "k"}),
-              "A TLS certificate needs its key, and a key its certificate.");
+              "--tls-certificate and --tls-key must be given together.");
     EXPECT_EQ(refusal({"--module", "a", "--allow-remote"}),
               "--allow-remote needs --tls-certificate and --tls-key.");
 }
 
 TEST(Config, AKeyThatIsWrongIsNamed) {
     EXPECT_EQ(refusal({"--config", "/nowhere"}),
-              "The configuration file /nowhere cannot be read: No such file or directory.");
-    EXPECT_EQ(refusal({"--config", "/tmp"}), "The configuration file /tmp cannot be read: Is a directory.");
+              "Cannot read /nowhere: No such file or directory.");
+    EXPECT_EQ(refusal({"--config", "/tmp"}), "Cannot read /tmp: Is a directory.");
     EXPECT_TRUE(refusalOfFile("listen = x").starts_with(" is not a JSON object: line 1, column 1"));
     EXPECT_TRUE(refusalOfFile("[]").starts_with(" is not a JSON object: line 1, column 1"));
     EXPECT_TRUE(
         refusalOfFile("{\n \"workers\": 1,\n \"workers\": 2}").starts_with(" is not a JSON object: line 3"));
     for (const char* key : {"nonsense", "config", "help", "version", "--listen", "max_body"}) {
         const std::string name = "\"" + std::string(key) + "\"";
-        EXPECT_EQ(refusalOfFile("{" + name + ": \"x\"}"), ": " + name + " is no setting. --help lists them.");
+        EXPECT_EQ(refusalOfFile("{" + name + ": \"x\"}"),
+                  ": " + name + " is not a setting. --help lists them.");
     }
     const std::vector<std::pair<std::string, std::string>> wrong{
         {R"("max-body":true)", "a whole number from 1024 to 1073741824"},
@@ -238,11 +239,11 @@ TEST(Config, AKeyThatIsWrongIsNamed) {
         {R"("socket":7)", "a text"},
         {R"("socket":["/s"])", "a text"},
         {R"("socket":null)", "a text"},
-        {R"("socket":"")", "a text that is not empty"},
+        {R"("socket":"")", "a non-empty text"},
         {R"("listen":"127.0.0.1:80")", "a list of texts"},
         {R"("listen":["127.0.0.1:80",7])", "a list of texts"},
         {R"("listen":{})", "a list of texts"},
-        {R"("host-name":[""])", "a text that is not empty"},
+        {R"("host-name":[""])", "a non-empty text"},
     };
     for (const auto& [pair, expected] : wrong) {
         const std::size_t colon = pair.find(':');

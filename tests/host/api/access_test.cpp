@@ -319,7 +319,7 @@ TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
     const Answer answer = post("/api/tokens", R"({"name":"x","role":"admin"})");
     EXPECT_EQ(answer.status, 500);
     EXPECT_EQ(answer.json()["detail"],
-              "The file of tokens " + settings.tokenFile.string() + " cannot be written: Not a directory.");
+              "Cannot make " + (parent / ".tokens.json.new").string() + ": Not a directory.");
     EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
 }
 

@@ -56,7 +56,7 @@ TEST_F(HostRows, ARefusedParameterIsExplained) {
     const Json::Value problem = answer.json();
     EXPECT_EQ(problem["code"], 1901);
     EXPECT_EQ(problem["status"], 422);
-    EXPECT_EQ(problem["title"], "A parameter is not acceptable");
+    EXPECT_EQ(problem["title"], "A parameter is invalid");
     EXPECT_EQ(problem["request_id"], answer.header("x-request-id"));
     ASSERT_EQ(problem["errors"].size(), 1U);
     EXPECT_EQ(problem["errors"][0]["field"], "portnum");

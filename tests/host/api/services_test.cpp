@@ -42,8 +42,7 @@ TEST_F(HostServices, AChangeIsNotDoneWhileAServiceIsDown) {
         EXPECT_EQ(problem["title"], "A service that is switched on does not run");
         EXPECT_EQ(
             problem["detail"],
-            "What was asked for is stored, but a service does not follow. The FTP service does not run. The "
-            "FTP daemon does not start: no luck.");
+            "The change is stored. The FTP service does not run. The FTP daemon does not start: no luck.");
         EXPECT_EQ(problem["down"][0]["service"], "ftp");
         EXPECT_EQ(problem["changed"], i == 1);
         EXPECT_EQ(access.starts, i) << "each change tries to start it";
@@ -68,10 +67,8 @@ TEST_F(HostServices, AServiceWithFormerSettingsIsNotDoneEither) {
     access.down = {{"sftp", "The configuration was refused.", true}};
     const Answer answer = post(chroot + "1/add", R"({"id":["eve"]})");
     EXPECT_EQ(answer.status, 500);
-    EXPECT_EQ(
-        answer.json()["detail"],
-        "What was asked for is stored, but a service does not follow. The SFTP service runs with its former "
-        "settings. The configuration was refused.");
+    EXPECT_EQ(answer.json()["detail"], "The change is stored. The SFTP service runs with its former "
+                                       "settings. The configuration was refused.");
 }
 
 TEST_F(HostServices, ReadsAndRefusalsStartNothing) {

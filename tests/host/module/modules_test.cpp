@@ -39,10 +39,10 @@ TEST(Modules, SeveralAreLoaded) {
 }
 
 TEST(Modules, WhatCannotBeLoadedIsNamed) {
-    EXPECT_TRUE(contains(reason({"/nowhere/module.so"}), "cannot be loaded: /nowhere/module.so"));
-    EXPECT_TRUE(contains(reason({WRONG_NO_TABLE}), "does not export GetAPITable."));
-    EXPECT_TRUE(contains(reason({WRONG_NULL_TABLE}), "hands out no API table."));
-    EXPECT_TRUE(contains(reason({WRONG_INCOMPLETE_ROW}), "incomplete row in its API table, at position 2."));
+    EXPECT_TRUE(contains(reason({"/nowhere/module.so"}), "Cannot load the module: /nowhere/module.so"));
+    EXPECT_TRUE(contains(reason({WRONG_NO_TABLE}), " is not a module: it does not export GetAPITable."));
+    EXPECT_TRUE(contains(reason({WRONG_NULL_TABLE}), "returns no API table."));
+    EXPECT_TRUE(contains(reason({WRONG_INCOMPLETE_ROW}), "Row 2 of the API table of "));
     EXPECT_TRUE(contains(reason({WRONG_UNDEFINED_SYMBOL}), "undefined symbol: VELTNobodyDefinesThis"));
 }
 
@@ -99,7 +99,7 @@ TEST_F(RudeModule, WhateverIsThrownIsAnAnswer) {
     EXPECT_EQ(exception.json()["request_id"], exception.header("x-request-id"));
     const Answer other = call("throws_int");
     EXPECT_EQ(other.status, 500);
-    EXPECT_TRUE(contains(other.body, "threw something that is no exception"));
+    EXPECT_TRUE(contains(other.body, "threw something other than an exception"));
     EXPECT_EQ(call("parameters").status, 200);
 }
 
