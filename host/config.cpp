@@ -288,6 +288,7 @@ Config readConfig(const std::vector<std::string>& words) {
 
 const char* usage() {
     return "Usage: veltd --module FILE [OPTION]...\n"
+           "       veltd trial start|stop FOLDER\n"
            "Serves the modules' APIs over HTTP.\n\n"
            "  --config FILE            read settings from a JSON object whose keys are these options;\n"
            "                           options given here override it\n"

@@ -2,16 +2,21 @@
 
 #include "host/api/app.h"
 #include "host/base/host_log.h"
+#include "host/base/instance_lock.h"
 #include "host/base/json.h"
 #include "host/base/open_file_limit.h"
 #include "host/config.h"
 #include "host/http/server.h"
 #include "host/module/module_table.h"
+#include "host/trial/trial.h"
 #include "standalone/standalone.h"
+
+#include <unistd.h>
 
 #include <csignal>
 #include <cstdio>
 #include <exception>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -23,23 +28,24 @@ using velt::host::Config;
 using velt::host::HostLog;
 using velt::host::HttpLimits;
 using velt::host::HttpServer;
+using velt::host::InstanceLock;
 using velt::host::Listener;
 
 constexpr int usageError = 2;
 
-/// The signals that end the host wait for sigwait, in every thread.
+/// Blocks the signals that end the host, in every thread to come, for sigwait.
 sigset_t blockEndSignals() {
     sigset_t signals;
     sigemptyset(&signals);
     sigaddset(&signals, SIGTERM);
     sigaddset(&signals, SIGINT);
     pthread_sigmask(SIG_BLOCK, &signals, nullptr);
-    // A client that leaves early must not end the host.
+    // A client that disconnects early must not end the host.
     std::signal(SIGPIPE, SIG_IGN); // NOLINT(cert-err33-c)
     return signals;
 }
 
-/// Adds all listening sockets and returns the line for --print-ready.
+/// Opens all listening sockets and returns what --print-ready shows.
 Json::Value listenEverywhere(const Config& config, HttpServer& server, HostLog& log) {
     std::vector<Listener> listeners = Listener::inherited(config.allowRemote);
     if (listeners.empty()) {
@@ -62,7 +68,7 @@ Json::Value listenEverywhere(const Config& config, HttpServer& server, HostLog& 
     return ready;
 }
 
-/// The configured limits, with as many connections as the process may have.
+/// The configured limits, with no more connections than the process may have.
 HttpLimits possibleLimits(const Config& config, HostLog& log) {
     HttpLimits limits = config.limits;
     limits.connections = velt::host::makeRoomForConnections(limits.connections);
@@ -92,7 +98,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
         log.write("not every enabled service started: " + velt::lastErrorSentence());
     }
     if (velt::watchServices() < 0) {
-        log.write("nothing watches the services: " + velt::lastErrorSentence());
+        log.write("cannot watch the services: " + velt::lastErrorSentence());
     }
     server.start(config.ioThreads);
     if (config.printReady) {
@@ -111,12 +117,22 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
 } // namespace
 
 int main(int argc, char** argv) {
+    const std::vector<std::string> words(argv + 1, argv + argc);
+    if (!words.empty() && words[0] == "trial") {
+        return velt::host::runTrial({words.begin() + 1, words.end()});
+    }
     HostLog log;
     try {
-        const Config config = velt::host::readConfig(std::vector<std::string>(argv + 1, argv + argc));
+        const Config config = velt::host::readConfig(words);
         if (config.help || config.version) {
             std::printf("%s", config.help ? velt::host::usage() : "veltd " VELT_VERSION "\n");
             return 0;
+        }
+        // What this process inherited is not for the programs that it starts.
+        close_range(STDERR_FILENO + 1, ~0U, CLOSE_RANGE_CLOEXEC);
+        const auto lock = InstanceLock::take(config.stateRoot);
+        if (!lock) {
+            throw std::runtime_error(lock.error().message);
         }
         const sigset_t signals = blockEndSignals();
         serve(config, signals, log);

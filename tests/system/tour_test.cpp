@@ -10,6 +10,7 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -55,6 +56,21 @@ protected:
         return result.output + result.errors;
     }
 
+    /// The process that a start has told of.
+    static std::string processIn(const std::string& output) {
+        std::smatch match;
+        EXPECT_TRUE(std::regex_search(output, match, std::regex("as process ([0-9]+)"))) << output;
+        return match[1];
+    }
+
+    void expectNothingRuns(const std::string& when) const {
+        EXPECT_EQ(run(tree_, "scripts/start --stop"), stopped) << when;
+        EXPECT_EQ(lastingProcesses(), "") << when;
+        EXPECT_FALSE(somethingListens()) << when;
+    }
+
+    inline static const std::string stopped =
+        "veltd and its services are stopped; var/ keeps their settings.\n";
     const fs::path tree_ = "/mnt/tour";
 };
 
@@ -106,11 +122,9 @@ TEST_F(QuickStart, theTourGoesAsTheReadmeSays) {
 TEST_F(QuickStart, aSecondStartChangesNothing) {
     const std::string first = run(tree_, startBuilt);
     const std::string settings = run(tree_, ". var/env; veltctl ftp set enable_ftp=on; veltctl export");
-    const std::string process = readFileText(tree_ / "var/veltd.pid");
     const std::string second = run(tree_, startBuilt);
-    EXPECT_TRUE(contains(second, "veltd runs already, as process ")) << second;
+    EXPECT_TRUE(contains(second, "veltd runs already, as process " + processIn(first) + ".")) << second;
     EXPECT_TRUE(contains(second, "127.0.0.1:2121, on and off")) << second;
-    EXPECT_EQ(readFileText(tree_ / "var/veltd.pid"), process);
     EXPECT_EQ("enable_ftp: off -> on\n" + run(tree_, ". var/env; veltctl export"), settings);
     EXPECT_EQ(modeOf(tree_ / "var/token"), 0600U);
     EXPECT_EQ(modeOf(tree_ / "var/env"), 0600U);
@@ -119,13 +133,90 @@ TEST_F(QuickStart, aSecondStartChangesNothing) {
 TEST_F(QuickStart, whatWasOnIsOnAgainAfterAStop) {
     run(tree_,
         startBuilt + "; . var/env; veltctl ftp set enable_ftp=on portnum=2100; veltctl sftp set enable=on");
-    EXPECT_EQ(run(tree_, "scripts/start --stop"),
-              "veltd and its services are stopped; var/ keeps their settings.\n");
-    EXPECT_EQ(lastingProcesses(), "");
+    expectNothingRuns("after a stop");
     const std::string again = run(tree_, startBuilt);
     EXPECT_TRUE(contains(again, "127.0.0.1:2100, on and off")) << again;
     EXPECT_TRUE(contains(again, "127.0.0.1:2222, on")) << again;
     EXPECT_EQ(run(tree_, "curl -sS ftp://127.0.0.1:2100/"), "");
+}
+
+TEST_F(QuickStart, aStartThatIsKilledIsStoppedAndStartedAgain) {
+    for (int milliseconds = 3; milliseconds < 500; milliseconds += 25) {
+        const std::string limit = "0." + std::to_string(1000 + milliseconds).substr(1);
+        // Every other time, what the one before has left is there.
+        const std::string before = milliseconds % 2 == 1 ? "rm -rf var; " : "";
+        run(tree_, before + "timeout --signal KILL " + limit + " " + startBuilt + " >/dev/null");
+        expectNothingRuns("killed after " + limit + " s");
+    }
+    run(tree_, "timeout --signal KILL 0.150 " + startBuilt);
+    const std::string start = run(tree_, startBuilt);
+    EXPECT_TRUE(contains(start, "127.0.0.1:2121, off and off")) << start;
+    EXPECT_EQ(run(tree_, ". var/env; veltctl ftp set enable_ftp=on"), "enable_ftp: off -> on\n");
+}
+
+TEST_F(QuickStart, aVeltdThatIsKilledLeavesServicesThatAreFound) {
+    const std::string first = run(tree_, startBuilt + "; . var/env; veltctl ftp set enable_ftp=on");
+    run(tree_, "kill -KILL " + processIn(first));
+    const std::string second = run(tree_, startBuilt);
+    EXPECT_TRUE(contains(second, "veltd runs, as process ")) << second;
+    EXPECT_TRUE(contains(second, "127.0.0.1:2121, on and off")) << second;
+    run(tree_, "kill -KILL " + processIn(second));
+    expectNothingRuns("after both were killed");
+}
+
+TEST_F(QuickStart, veltdRunsOnceForAFolder) {
+    run(tree_, startBuilt);
+    const std::string second =
+        run(tree_, std::string(VELT_BUILT_FOLDER) + "/veltd --state-root var --socket other --module " +
+                       VELT_BUILT_FOLDER + "/VELT.Core.FileServ.FTP.so; echo $?");
+    EXPECT_TRUE(contains(second, "veltd: veltd already runs below var, as process ")) << second;
+    EXPECT_TRUE(second.ends_with("\n1\n")) << second;
+}
+
+TEST_F(QuickStart, anotherUserIsToldWhoseItIs) {
+    run(tree_, startBuilt);
+    fs::permissions(tree_, fs::perms::all);
+    const std::vector<std::string> asAlice{"setpriv", "--reuid", "alice",
+                                           "--regid", "alice",   "--clear-groups"};
+    const std::string start =
+        "var/ was made by root. Start as that user, or stop what runs and remove var/.\n1\n";
+    EXPECT_EQ(run(tree_, startBuilt + "; echo $?", asAlice), start);
+    EXPECT_EQ(run(tree_, "scripts/start; echo $?", asAlice), start) << "before anything is built";
+    EXPECT_EQ(run(tree_, "scripts/start --stop; echo $?", asAlice),
+              "var/ was made by root. Stop it as that user, or as root.\n1\n");
+    fs::permissions(tree_, fs::perms(0755));
+    EXPECT_EQ(run(tree_, "scripts/start; echo $?", asAlice),
+              "You may not write to /mnt/tour. Start as root, or from a copy of your own.\n1\n");
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd runs already"));
+}
+
+TEST_F(QuickStart, aPathThatTheDaemonsCannotHoldIsRefusedAtOnce) {
+    for (const std::string name : {"100%", "a\"b", "a\\b", "a*b"}) {
+        const fs::path odd = fs::path("/mnt") / name;
+        furnishTree(odd);
+        const std::string refusal =
+            "The FTP daemon's configuration cannot hold a path with \" \\ % or * in it: " + odd.string() +
+            "\n1\n";
+        EXPECT_EQ(run("'" + odd.string() + "'", "scripts/start; echo $?"), refusal);
+        EXPECT_EQ(run("'" + odd.string() + "'", startBuilt + "; echo $?"), refusal);
+        EXPECT_FALSE(fs::exists(odd / "var"));
+        fs::remove_all(odd);
+    }
+}
+
+TEST_F(QuickStart, saysWhyItCannotGoOn) {
+    run(tree_, "mkdir -p var/token");
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "Cannot read token: Is a directory.\n"));
+    expectNothingRuns("without a token");
+    run(tree_, "rmdir var/token; rm var/var/lib/velt/tokens.json; mkdir var/var/lib/velt/.tokens.json.new");
+    const std::string start = run(tree_, startBuilt);
+    EXPECT_TRUE(contains(start, "tokens.json")) << start;
+    EXPECT_TRUE(contains(start, ": Is a directory.\n")) << start;
+    run(tree_, "scripts/start --stop; rmdir var/var/lib/velt/.tokens.json.new; echo '{' "
+               ">var/var/lib/velt/tokens.json");
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd did not start:\n"));
+    EXPECT_EQ(run("/mnt", std::string(VELT_BUILT_FOLDER) + "/veltd trial stop nowhere; echo $?"),
+              "Cannot enter nowhere/: No such file or directory.\n1\n");
 }
 
 TEST_F(QuickStart, takesOtherPortsWhereItsOwnAreTaken) {

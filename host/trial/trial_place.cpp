@@ -1,0 +1,71 @@
+#include "host/trial/trial_place.h"
+
+#include "host/trial/trial_error.h"
+
+#include <grp.h>
+#include <pwd.h>
+#include <sched.h>
+#include <sys/mount.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <functional>
+
+namespace velt::host {
+
+namespace {
+
+constexpr const char* viewMount = "/media";
+constexpr const char* viewRoot = "/media/velt";
+
+/// Whether the test holds in a process of its own, which it may change.
+bool holdsInChild(const std::function<bool()>& test) {
+    const pid_t child = ::fork();
+    if (child == 0) {
+        ::_exit(test() ? 0 : 1);
+    }
+    int status = 1;
+    return child > 0 && ::waitpid(child, &status, 0) == child && status == 0;
+}
+
+bool mayEnter(const passwd& account, const std::filesystem::path& folder) {
+    return holdsInChild([&] {
+        return ::setgroups(0, nullptr) == 0 && ::setgid(account.pw_gid) == 0 &&
+               ::setuid(account.pw_uid) == 0 && ::access(folder.c_str(), X_OK) == 0;
+    });
+}
+
+} // namespace
+
+bool mayMount() {
+    return holdsInChild([] { return ::unshare(CLONE_NEWNS) == 0; });
+}
+
+TrialPlace findPlace(const std::filesystem::path& folder) {
+    if (::geteuid() != 0) {
+        return {folder, false};
+    }
+    const passwd* const account = ::getpwnam("ftp"); // NOLINT(concurrency-mt-unsafe)
+    if (account == nullptr) {
+        throw TrialError("There is no account ftp. Install the package proftpd-core, which makes it.");
+    }
+    if (mayEnter(*account, folder)) {
+        return {folder, false};
+    }
+    if (!mayMount()) {
+        throw TrialError("The account ftp, which serves anonymous users, cannot get to " + folder.string() +
+                         ": a folder on the way is closed.\nMove this tree to a folder that everybody may "
+                         "enter, such as /srv, and start again.");
+    }
+    return {viewRoot, true};
+}
+
+bool enterView(const std::filesystem::path& folder, const TrialPlace& place) {
+    return ::unshare(CLONE_NEWNS) == 0 && ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
+           ::mount("velt", viewMount, "tmpfs", 0, "mode=755") == 0 &&
+           ::mkdir(place.root.c_str(), 0755) == 0 &&
+           ::mount(folder.c_str(), place.root.c_str(), nullptr, MS_BIND, nullptr) == 0;
+}
+
+} // namespace velt::host

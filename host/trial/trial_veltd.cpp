@@ -1,0 +1,203 @@
+#include "host/trial/trial_veltd.h"
+
+#include "base/file.h"
+#include "base/sha256.h"
+#include "host/base/instance_lock.h"
+#include "host/http/listener.h"
+#include "host/trial/trial_error.h"
+#include "standalone/standalone.h"
+
+#include <fcntl.h>
+#include <poll.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <functional>
+#include <system_error>
+#include <thread>
+#include <vector>
+
+extern "C" { // which the header of glibc 2.36 forgets
+#include <sys/pidfd.h>
+}
+
+namespace velt::host {
+
+namespace {
+
+constexpr const char* logName = "veltd.log";
+constexpr const char* moduleName = "VELT.Core.FileServ.FTP.so";
+constexpr std::array<const char*, 7> programNames{"veltd",
+                                                  "veltctl",
+                                                  "velt-supervise",
+                                                  "velt-login-view",
+                                                  moduleName,
+                                                  "libvelt-standalone.so",
+                                                  "mod_velt_login.so"};
+constexpr int firstHttpPort = 8080;
+constexpr int lastHttpPort = 8099;
+
+std::string systemError() {
+    return std::generic_category().message(errno);
+}
+
+/// The last lines of veltd's log.
+std::string lastLogLines() {
+    constexpr int wanted = 3;
+    const auto file = readFile(logName);
+    std::string text = file ? *file : file.error().message;
+    text.erase(text.find_last_not_of('\n') + 1);
+    std::size_t begin = text.size() + 1;
+    for (int i = 0; i < wanted && begin > 0; ++i) {
+        begin = begin < 2 ? 0 : text.rfind('\n', begin - 2) + 1;
+    }
+    return text.substr(begin);
+}
+
+void waitForAnswer(const std::function<bool()>& runs) {
+    const VeltdClient client(socketName);
+    while (true) {
+        try {
+            client.get("/healthz");
+            return;
+        } catch (const TrialError&) {
+            if (!runs()) {
+                throw TrialError("veltd did not start:\n" + lastLogLines());
+            }
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    }
+}
+
+/// What becomes veltd: a process that nobody who ends this one ends with it.
+[[noreturn]] void becomeVeltd(const std::filesystem::path& folder, const TrialPlace& place, int httpPort) {
+    ::setsid();
+    const int log = ::open(logName, O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0644);
+    ::dup2(::open("/dev/null", O_RDWR | O_CLOEXEC), STDIN_FILENO);
+    ::dup2(log, STDOUT_FILENO);
+    ::dup2(log, STDERR_FILENO);
+    // The lock goes on with the new program. Until that runs, the lock of the start is held, too: whoever
+    // waits for that one finds this process afterwards.
+    const auto lock = InstanceLock::take(".");
+    if (!lock) {
+        std::fprintf(stderr, "%s\n", lock.error().message.c_str());
+        ::_exit(1);
+    }
+    lock->keepOverExec();
+    if (place.needsView && !enterView(folder, place)) {
+        std::fprintf(stderr, "Cannot mount %s: %s.\n", place.root.c_str(), systemError().c_str());
+        ::_exit(1);
+    }
+    const std::filesystem::path programs = programFolder();
+    ::setenv("VELT_LIBEXEC_DIR", programs.c_str(), 1); // NOLINT(concurrency-mt-unsafe)
+    const std::string program = programs / "veltd";
+    const std::string module = programs / moduleName;
+    const std::string address = "127.0.0.1:" + std::to_string(httpPort);
+    ::execl(program.c_str(), "veltd", "--state-root", place.root.c_str(), "--module", module.c_str(),
+            "--listen", address.c_str(), "--socket", socketName, nullptr);
+    std::fprintf(stderr, "Cannot run %s: %s.\n", program.c_str(), systemError().c_str());
+    ::_exit(1);
+}
+
+/// Ends the process that holds the lock, and waits for it.
+void endVeltd(pid_t process) {
+    constexpr int longestEnd = 70'000;
+    const UniqueFd handle(::pidfd_open(process, 0));
+    // Behind the handle it is this process and no later one of its number.
+    if (!handle || runningVeltd() != process) {
+        return;
+    }
+    pollfd ended{handle.get(), POLLIN, 0};
+    if (::pidfd_send_signal(handle.get(), SIGTERM, nullptr, 0) != 0 || ::poll(&ended, 1, longestEnd) != 1) {
+        throw TrialError("veltd, process " + std::to_string(process) + ", does not end.");
+    }
+}
+
+} // namespace
+
+std::filesystem::path programFolder() {
+    return std::filesystem::read_symlink("/proc/self/exe").parent_path();
+}
+
+std::string buildOf(const std::filesystem::path& programs) {
+    std::string marks = programs.string();
+    for (const char* name : programNames) {
+        struct stat status {};
+        if (::stat((programs / name).c_str(), &status) != 0) {
+            throw TrialError((programs / name).string() + " is missing: build it first.");
+        }
+        marks += " " + std::to_string(status.st_ino) + " " + std::to_string(status.st_size) + " " +
+                 std::to_string(status.st_mtim.tv_sec) + "." + std::to_string(status.st_mtim.tv_nsec);
+    }
+    return sha256(marks);
+}
+
+std::optional<pid_t> runningVeltd() {
+    return InstanceLock::holder(".");
+}
+
+void linkPrograms() {
+    std::error_code error;
+    std::filesystem::remove("programs.new", error);
+    std::filesystem::create_directory_symlink(programFolder(), "programs.new", error);
+    if (!error) {
+        std::filesystem::rename("programs.new", "programs", error);
+    }
+    if (error) {
+        throw TrialError("Cannot make the link programs: " + error.message() + ".");
+    }
+}
+
+pid_t launchVeltd(const std::filesystem::path& folder, const TrialPlace& place, int httpPort) {
+    const pid_t child = ::fork();
+    if (child < 0) {
+        throw TrialError("Cannot start a process: " + systemError() + ".");
+    }
+    if (child == 0) {
+        becomeVeltd(folder, place, httpPort);
+    }
+    waitForAnswer([child] { return ::waitpid(child, nullptr, WNOHANG) == 0; });
+    return child;
+}
+
+void waitForVeltd() {
+    waitForAnswer([] { return runningVeltd().has_value(); });
+}
+
+void stopVeltd(const std::filesystem::path& folder) {
+    if (const auto process = runningVeltd()) {
+        endVeltd(*process);
+    }
+    if (openState(folder) < 0 || stopServices() < 0) {
+        throw TrialError(lastErrorSentence());
+    }
+}
+
+int chooseHttpPort(int former) {
+    std::vector<int> candidates;
+    if (former != 0) {
+        candidates.push_back(former);
+    }
+    for (int port = firstHttpPort; port <= lastHttpPort; ++port) {
+        candidates.push_back(port);
+    }
+    for (const int port : candidates) {
+        try {
+            Listener::tcp("127.0.0.1:" + std::to_string(port), false);
+            return port;
+        } catch (const ListenError&) {
+            continue;
+        }
+    }
+    throw TrialError("The ports " + std::to_string(firstHttpPort) + " to " + std::to_string(lastHttpPort) +
+                     " of 127.0.0.1 are taken.");
+}
+
+} // namespace velt::host
