@@ -7,9 +7,8 @@ namespace velt::host {
 PlatformRequest::PlatformRequest(const std::string& actor, const std::string& address) {
     clearLastError();
     setRequestActor(actor, address);
-    setEffectReport([this](Effect effect, std::string_view subject, int result, std::chrono::nanoseconds) {
-        note(effect, subject, result >= 0);
-    });
+    setEffectReport([this](Effect effect, std::string_view subject, const Result<>& outcome,
+                           std::chrono::nanoseconds) { note(effect, subject, bool(outcome)); });
 }
 
 PlatformRequest::~PlatformRequest() {

@@ -2,7 +2,6 @@
 
 #include "standalone/core/last_error.h"
 
-#include <optional>
 #include <utility>
 
 namespace velt {
@@ -19,43 +18,24 @@ EffectReport& threadReport() {
     return report;
 }
 
-int actAndReport(Effect effect, std::string_view subject, const std::function<int()>& act) {
+Result<> actAndReport(Effect effect, std::string_view subject, const std::function<Result<>()>& act) {
     // A copy, since the effect may set another one while it runs.
     const EffectReport report = threadReport();
     if (!report)
         return act();
     const auto start = std::chrono::steady_clock::now();
-    const auto tell = [&](int result) {
-        report(effect, subject, result, std::chrono::steady_clock::now() - start);
+    const auto tell = [&](const Result<>& outcome) {
+        report(effect, subject, outcome, std::chrono::steady_clock::now() - start);
     };
-    int result = -1;
     try {
-        result = act();
+        Result<> outcome = act();
+        tell(outcome);
+        return outcome;
     } catch (...) {
         // Part of it may have been done.
-        tell(-1);
+        tell(Error("It ended with an exception."));
         throw;
     }
-    tell(result);
-    return result;
-}
-
-ErrorNumber errorOf(Effect effect) {
-    switch (effect) {
-    case Effect::store:
-    case Effect::runKey:
-        return ErrorNumber::store;
-    case Effect::firewall:
-        return ErrorNumber::firewall;
-    case Effect::stop:
-    case Effect::start:
-        return ErrorNumber::daemon;
-    case Effect::event:
-        return ErrorNumber::event;
-    case Effect::logEntry:
-        return ErrorNumber::log;
-    }
-    return ErrorNumber::invalid;
 }
 
 } // namespace
@@ -80,27 +60,20 @@ std::string_view effectName(Effect effect) {
     return "";
 }
 
-int perform(Effect effect, std::string_view subject, const std::function<int()>& act) {
+Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act) {
     // A copy, since the hook may replace itself while it runs.
     const EffectHook hook = threadHook();
-    const EffectDecision decision = hook ? hook(effect, subject) : EffectDecision{};
-    if (decision.doIt)
-        return actAndReport(effect, subject, act);
-    if (decision.result < 0)
-        fail(errorOf(effect), "The effect \"" + std::string(effectName(effect)) + "\" on " +
-                                  std::string(subject) + " was refused.");
-    return decision.result;
+    const EffectDecision decision = hook ? hook(effect, subject) : std::nullopt;
+    return decision ? *decision : actAndReport(effect, subject, act);
 }
 
-Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act) {
-    std::optional<Result<>> outcome;
-    const int result = perform(effect, subject, std::function<int()>([&] {
-                                   outcome = act();
-                                   return *outcome ? 0 : -1;
-                               }));
-    if (outcome)
-        return *outcome;
-    return result < 0 ? Result<>(lastErrorAsValue()) : Result<>();
+int perform(Effect effect, std::string_view subject, const std::function<int()>& act) {
+    const auto outcome = perform(effect, subject, [&act]() -> Result<> {
+        if (act() < 0)
+            return lastErrorAsValue();
+        return {};
+    });
+    return outcome ? 0 : fail(outcome.error());
 }
 
 void setEffectHook(EffectHook hook) {

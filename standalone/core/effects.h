@@ -7,7 +7,7 @@
 
 #include <chrono>
 #include <functional>
-#include <string>
+#include <optional>
 #include <string_view>
 
 namespace velt {
@@ -25,26 +25,25 @@ enum class Effect {
 /// The effect's name: "store", "firewall", "stop", "start", "run key", "event", "log".
 std::string_view effectName(Effect effect);
 
-/// Does the effect by calling `act` and returns its result (negative: failed, last error set). `subject` says
-/// what it concerns ("ftp settings", "ftpd", "velt.service.action"). The hook of the calling thread, when
-/// there is one, is asked first, and its report, when there is one, is told after.
-int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
+/// Does the effect by calling `act` and returns its outcome. `subject` says what it concerns ("ftp settings",
+/// "ftpd", "velt.service.action"). The hook of the calling thread, when there is one, is asked first, and its
+/// report, when there is one, is told after.
 Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act);
 
-/// What a hook decides about one effect: do it, or leave it undone with this result.
-struct EffectDecision {
-    bool doIt = true;
-    int result = 0;
-};
+/// The same for an act that sets the last error.
+int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
+
+/// What a hook decides about one effect: nothing, so that it is done, or the outcome of leaving it undone.
+using EffectDecision = std::optional<Result<>>;
 using EffectHook = std::function<EffectDecision(Effect effect, std::string_view subject)>;
 
 /// Sets the calling thread's hook in place of its former one; an empty function removes it.
 void setEffectHook(EffectHook hook);
 
-/// Told of each effect that was done, or tried, with its result (negative: failed; also when it threw) and
-/// what it took. One that lies within another ("host keys" within a start) comes before it. Not told of those
-/// that the hook left undone. Must not throw, nor change the last error.
-using EffectReport = std::function<void(Effect effect, std::string_view subject, int result,
+/// Told of each effect that was done, or tried, with its outcome (an error, too, when it threw) and what it
+/// took. One that lies within another ("host keys" within a start) comes before it. Not told of those that
+/// the hook left undone. Must not throw, nor change the last error.
+using EffectReport = std::function<void(Effect effect, std::string_view subject, const Result<>& outcome,
                                         std::chrono::nanoseconds duration)>;
 
 /// Sets the calling thread's report in place of its former one; an empty function removes it.

@@ -65,12 +65,12 @@ void reportEffects(const Request& ended) {
     const auto& journal = fake::Platform::instance().journal;
     for (std::size_t i = ended.journalStart; i < journal.size(); ++i) {
         if (const auto effect = effectOf(fake::Platform::operationOf(journal[i]))) {
-            ended.report(*effect, "sftp", 0, {});
+            ended.report(*effect, "sftp", velt::Result<>(), {});
             tellSubscribers(*effect);
         }
     }
     if (FakeStandalone::instance().storeFails) {
-        ended.report(Effect::store, "settings", -1, {});
+        ended.report(Effect::store, "settings", velt::Error("Refused."), {});
     }
 }
 

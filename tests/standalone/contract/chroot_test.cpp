@@ -144,9 +144,10 @@ TEST_F(ChrootContract, storingIsAnEffectThatCanFail) {
     setEffectHook([](Effect effect, std::string_view subject) -> EffectDecision {
         EXPECT_EQ(effect, Effect::store);
         EXPECT_EQ(subject, "chroot rules");
-        return {false, -1};
+        return Error("Refused.");
     });
     EXPECT_LT(add({"ann"}), 0);
+    EXPECT_EQ(lastErrorSentence(), "Refused.");
     setEffectHook({});
     EXPECT_EQ(chrootUsers(), Names());
 }

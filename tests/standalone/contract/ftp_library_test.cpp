@@ -203,7 +203,7 @@ TEST_F(FtpContract, EachStoreIsOneNamedEffect) {
     std::vector<std::string> effects;
     setEffectHook([&](Effect effect, std::string_view subject) {
         effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     EXPECT_EQ(VELTFTPTimeOutSet(1), 0);
     EXPECT_EQ(VELTFTPConfSet(record()), 0);

@@ -270,7 +270,7 @@ TEST_F(ServicesTest, EveryOperationIsAnEffectThatCanBeListedInstead) {
     std::vector<std::string> listed;
     setEffectHook([&listed](Effect effect, std::string_view subject) {
         listed.push_back(std::string(effectName(effect)) + " " + std::string(subject));
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     EXPECT_EQ(VLIBServicectlStop("ftpd-pure", 0), 0);
     EXPECT_EQ(VLIBServicecfgRunKeySet("ftpd", 2), 0);

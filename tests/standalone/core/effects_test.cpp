@@ -1,7 +1,7 @@
 #include "standalone/core/effects.h"
 
-#include "platform/core.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
@@ -12,6 +12,16 @@
 namespace velt {
 namespace {
 
+using test::messageOf;
+
+Result<> succeed() {
+    return {};
+}
+
+Result<> refused() {
+    return Error("Refused.");
+}
+
 class Effects : public ::testing::Test {
 protected:
     ~Effects() override {
@@ -21,24 +31,32 @@ protected:
 };
 
 TEST_F(Effects, AreDoneWithoutAHook) {
-    EXPECT_EQ(perform(Effect::store, "ftp settings", [] { return 5; }), 5);
+    int done = 0;
+    EXPECT_EQ(messageOf(perform(Effect::store, "ftp settings",
+                                [&] {
+                                    ++done;
+                                    return Result<>();
+                                })),
+              "");
+    EXPECT_EQ(messageOf(perform(Effect::store, "ftp settings", refused)), "Refused.");
+    EXPECT_EQ(done, 1);
 }
 
 TEST_F(Effects, CanBeListedInsteadOfDone) {
     std::vector<std::string> listed;
     setEffectHook([&](Effect effect, std::string_view subject) {
         listed.push_back(std::string(effectName(effect)) + ": " + std::string(subject));
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     bool done = false;
     const auto act = [&] {
         done = true;
-        return 0;
+        return Result<>();
     };
 
     for (const Effect effect : {Effect::store, Effect::firewall, Effect::stop, Effect::start, Effect::runKey,
                                 Effect::event, Effect::logEntry})
-        EXPECT_EQ(perform(effect, "ftpd", act), 0);
+        EXPECT_TRUE(perform(effect, "ftpd", act));
 
     EXPECT_FALSE(done);
     EXPECT_EQ(listed, (std::vector<std::string>{"store: ftpd", "firewall: ftpd", "stop: ftpd", "start: ftpd",
@@ -46,56 +64,58 @@ TEST_F(Effects, CanBeListedInsteadOfDone) {
 }
 
 TEST_F(Effects, AreDoneWhenTheHookSaysSo) {
-    setEffectHook([](Effect, std::string_view) { return EffectDecision{}; });
-    EXPECT_EQ(perform(Effect::stop, "ftpd", [] { return 3; }), 3);
+    setEffectHook([](Effect, std::string_view) { return EffectDecision(); });
+    EXPECT_EQ(messageOf(perform(Effect::stop, "ftpd", refused)), "Refused.");
 }
 
-TEST_F(Effects, ThatAHookRefusesHaveAReason) {
-    setEffectHook([](Effect, std::string_view) { return EffectDecision{false, -1}; });
+TEST_F(Effects, ThatAHookRefusesHaveItsReason) {
+    setEffectHook(
+        [](Effect, std::string_view) { return EffectDecision(Error(ErrorNumber::firewall, "Not today.")); });
 
-    EXPECT_EQ(perform(Effect::firewall, "rules", [] { return 0; }), -1);
-    EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::firewall));
-    EXPECT_EQ(lastErrorSentence(), "The effect \"firewall\" on rules was refused.");
+    const Result<> refusal = perform(Effect::firewall, "rules", succeed);
+    ASSERT_FALSE(refusal);
+    EXPECT_EQ(refusal.error().number, ErrorNumber::firewall);
+    EXPECT_EQ(refusal.error().message, "Not today.");
 }
 
 TEST_F(Effects, AreReportedAfterTheyWereDone) {
     std::vector<std::string> reported;
     std::chrono::nanoseconds took{};
-    setEffectReport([&](Effect effect, std::string_view subject, int result, std::chrono::nanoseconds time) {
-        reported.push_back(std::string(effectName(effect)) + " " + std::string(subject) + " " +
-                           std::to_string(result));
-        took = time;
-    });
+    setEffectReport(
+        [&](Effect effect, std::string_view subject, const Result<>& outcome, std::chrono::nanoseconds time) {
+            reported.push_back(std::string(effectName(effect)) + " " + std::string(subject) +
+                               (outcome ? "" : ": " + outcome.error().message));
+            took = time;
+        });
     const auto slow = [&] {
         EXPECT_EQ(reported.size(), 0U) << "not before it is done";
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        return 7;
+        return Result<>();
     };
-    EXPECT_EQ(perform(Effect::start, "ftpd", slow), 7);
+    EXPECT_TRUE(perform(Effect::start, "ftpd", slow));
     EXPECT_GE(took, std::chrono::milliseconds(20));
-    EXPECT_EQ(
-        perform(Effect::start, "outer", [] { return perform(Effect::store, "inner", [] { return 0; }) - 1; }),
-        -1);
-    EXPECT_THROW(perform(Effect::stop, "ftpd", []() -> int { throw std::runtime_error("x"); }),
-                 std::runtime_error);
-    setEffectHook([](Effect, std::string_view) { return EffectDecision{false, 0}; });
-    EXPECT_EQ(perform(Effect::store, "undone", [] { return 0; }), 0);
-    EXPECT_EQ(reported,
-              (std::vector<std::string>{"start ftpd 7", "store inner 0", "start outer -1", "stop ftpd -1"}));
+    const auto outer = [] { return perform(Effect::store, "inner", succeed) ? refused() : succeed(); };
+    EXPECT_FALSE(perform(Effect::start, "outer", outer));
+    const auto throwing = []() -> Result<> { throw std::runtime_error("x"); };
+    EXPECT_THROW(static_cast<void>(perform(Effect::stop, "ftpd", throwing)), std::runtime_error);
+    setEffectHook([](Effect, std::string_view) { return EffectDecision(Result<>()); });
+    EXPECT_TRUE(perform(Effect::store, "undone", refused));
+    EXPECT_EQ(reported, (std::vector<std::string>{"start ftpd", "store inner", "start outer: Refused.",
+                                                  "stop ftpd: It ended with an exception."}));
 }
 
 TEST_F(Effects, HaveAHookForEachThread) {
-    setEffectHook([](Effect, std::string_view) { return EffectDecision{false, 1}; });
-    std::thread([] { EXPECT_EQ(perform(Effect::store, "x", [] { return 0; }), 0); }).join();
+    setEffectHook([](Effect, std::string_view) { return EffectDecision(refused()); });
+    std::thread([] { EXPECT_TRUE(perform(Effect::store, "x", succeed)); }).join();
 }
 
 TEST_F(Effects, AHookMayRemoveItself) {
     setEffectHook([](Effect, std::string_view) {
         setEffectHook({});
-        return EffectDecision{false, 1};
+        return EffectDecision(refused());
     });
-    EXPECT_EQ(perform(Effect::store, "x", [] { return 0; }), 1);
-    EXPECT_EQ(perform(Effect::store, "x", [] { return 0; }), 0);
+    EXPECT_FALSE(perform(Effect::store, "x", succeed));
+    EXPECT_TRUE(perform(Effect::store, "x", succeed));
 }
 
 } // namespace

@@ -249,7 +249,7 @@ TEST_F(FirewallTest, AListedEffectChangesNothing) {
     std::string listed;
     setEffectHook([&listed](Effect effect, std::string_view subject) {
         listed = std::string(effectName(effect)) + " " + std::string(subject);
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     EXPECT_EQ(VELTFwRuleHup(), 0);
     setEffectHook({});

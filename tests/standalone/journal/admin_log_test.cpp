@@ -185,7 +185,7 @@ TEST_F(AdminLogTest, IsAnEffectWithTheSentenceForItsSubject) {
     std::string seen;
     setEffectHook([&seen](Effect effect, std::string_view subject) {
         seen = std::string(effectName(effect)) + ": " + std::string(subject);
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     EXPECT_EQ(VELTLogSet1(2, 1, 0x11B00036, "", "", "", ""), 0);
     EXPECT_EQ(seen, "log: The SFTP service was enabled.");

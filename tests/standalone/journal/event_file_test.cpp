@@ -163,7 +163,7 @@ TEST_F(EventFileTest, IsAnEffectThatCanBeLeftUndone) {
     const Subscription subscription = subscribeEvents([&heard](const SystemEvent&) { ++heard; });
     setEffectHook([&seen](Effect effect, std::string_view subject) {
         seen = std::string(effectName(effect)) + " " + std::string(subject);
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     EXPECT_EQ(emit("velt.service.action", {}), 0);
     unsubscribe(subscription);

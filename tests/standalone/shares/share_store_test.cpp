@@ -94,9 +94,9 @@ TEST_F(ShareStoreTest, AStoreThatIsRefusedLeavesTheFile) {
     std::string seen;
     setEffectHook([&seen](Effect effect, std::string_view subject) {
         seen = std::string(effectName(effect)) + " " + std::string(subject);
-        return EffectDecision{false, -1};
+        return EffectDecision(Error("Refused."));
     });
-    EXPECT_FALSE(storeShares({shareCalled("new")}));
+    EXPECT_EQ(messageOf(storeShares({shareCalled("new")})), "Refused.");
     EXPECT_EQ(seen, "store shares");
     EXPECT_EQ(loadShares()->at(0).name, "old");
 }

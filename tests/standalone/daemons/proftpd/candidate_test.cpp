@@ -41,7 +41,7 @@ TEST_F(FtpCandidate, leavesNothingOfTheTestBehind) {
 }
 
 TEST_F(FtpCandidate, isTestedWithAThrowAwayCertificateWhereNothingMayBeStored) {
-    setEffectHook([](Effect, std::string_view) { return EffectDecision{false, 0}; });
+    setEffectHook([](Effect, std::string_view) { return EffectDecision(Result<>()); });
     FtpSettings settings = plainSettings();
     settings.record.service_flags = VELT_FTP_SERVICE_TLS;
     EXPECT_EQ(testFtpCandidate(settings), 0) << lastErrorSentence();

@@ -62,7 +62,7 @@ TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
     std::thread([&] {
         setEffectHook([&](Effect effect, std::string_view subject) {
             effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
-            return EffectDecision{false, 0};
+            return EffectDecision(Result<>());
         });
         EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
         EXPECT_LT(testSftpCandidate({true, 65536}), 0);

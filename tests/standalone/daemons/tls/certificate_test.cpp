@@ -90,7 +90,7 @@ TEST_F(ServerCertificates, areForATestOnlyWhereNothingMayBeStored) {
     std::vector<std::string> effects;
     setEffectHook([&](Effect effect, std::string_view subject) {
         effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
-        return EffectDecision{false, 0};
+        return EffectDecision(Result<>());
     });
     auto certificate = serverCertificate();
     setEffectHook({});
