@@ -45,7 +45,7 @@ Result<> readRecord(_tag_VELT_FTP_CONF_& record) {
 }
 
 Result<> storeRecord(const _tag_VELT_FTP_CONF_& record) {
-    const Result<> result = changeFtpSettings([&record](FtpSettings& settings) {
+    Result<> result = changeFtpSettings([&record](FtpSettings& settings) {
         settings.record = lastSeenRecord().merge(settings.record, record);
     });
     // Not what was stored in the end: the caller goes on with its own copy.

@@ -126,7 +126,7 @@ Result<> SideBySide::add(const std::string& name, const VisibleFolder& visible) 
         return failed("Cannot make the folder of the share");
     }
     const auto tree = mountAt(place, visible);
-    const Result<> shown = tree ? restrictWithin(*tree, visible.restrictions) : tree.error();
+    Result<> shown = tree ? restrictWithin(*tree, visible.restrictions) : tree.error();
     // A share without its restrictions must not stay.
     if (!shown && ((tree && umount2(place.c_str(), MNT_DETACH) < 0) || rmdir(place.c_str()) < 0)) {
         spoiled_ = true;
