@@ -142,7 +142,7 @@ TEST_F(HostRefusal, aRefusedValueIsExplained) {
         "portnum: expected an integer from 1 to 65535");
     expectFailure({"call", "VELT.Core.FileServ.FTP", "3", "set", R"({"enable_ftp": "yes"})"}, 3,
                   "enable_ftp: expected true or false");
-    expectFailure({"call", "VELT.Core.FileServ.FTP", "4", "set"}, 3, "Nothing is served");
+    expectFailure({"call", "VELT.Core.FileServ.FTP", "4", "set"}, 3, "There is nothing");
     expectFailure({"chroot", "rules", "add", "user", "nobody-like-this", "/home"}, 3,
                   "left out: user nobody-like-this /home");
     expectFailure({"chroot", "rules", "remove", "user", "alice"}, 3, "no rule for the user alice");
