@@ -1,5 +1,6 @@
 #include "host/api/openapi.h"
 
+#include "host/api/flat_schema.h"
 #include "host/api/openapi_document.h"
 #include "host/api/schema_words.h"
 #include "host/base/json.h"
@@ -59,6 +60,17 @@ std::string missingProperty(const std::string& description) {
     return description.substr(words.size(), end - words.size());
 }
 
+/// A parameter that is null counts as absent.
+Json::Value withoutNulls(const Json::Value& parameters) {
+    Json::Value given(Json::objectValue);
+    for (const std::string& name : parameters.getMemberNames()) {
+        if (!parameters[name].isNull()) {
+            given[name] = parameters[name];
+        }
+    }
+    return given;
+}
+
 } // namespace
 
 struct OpenApi::Schemas {
@@ -77,13 +89,12 @@ OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>(
     document_ = std::move(*document);
     const Json::Value& paths = document_["paths"];
     for (const std::string& path : paths.getMemberNames()) {
-        const Json::Value& source =
-            paths[path]["post"]["requestBody"]["content"]["application/json"]["schema"];
-        if (!source.isObject()) {
+        const Json::Value request = flatSchema(document_, paths[path]["post"]["requestBody"]);
+        if (!request.isObject()) {
             continue;
         }
         auto body = std::make_unique<Schemas::Body>();
-        body->source = source;
+        body->source = request["content"]["application/json"]["schema"];
         valijson::SchemaParser parser;
         parser.populateSchema(Adapter(body->source), body->compiled);
         schemas_->byPath.emplace(path, std::move(body));
@@ -106,7 +117,8 @@ std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& para
     // As strict about types as the module: the text "21" is not a number.
     valijson::Validator validator(valijson::Validator::kStrongTypes);
     valijson::ValidationResults results;
-    validator.validate(body.compiled, Adapter(parameters), &results);
+    const Json::Value given = withoutNulls(parameters);
+    validator.validate(body.compiled, Adapter(given), &results);
     for (const auto& error : results) {
         Path path = withoutBrackets(error.context);
         const std::string missing = missingProperty(error.description);

@@ -6,30 +6,10 @@ namespace velt::host {
 
 namespace {
 
-/// The type besides null: an optional parameter may be null, but nobody wants to read that.
-std::string typeOf(const Json::Value& schema) {
-    const Json::Value& type = schema["type"];
-    if (!type.isArray()) {
-        return type.isString() ? type.asString() : "";
-    }
-    for (const Json::Value& each : type) {
-        if (each != "null") {
-            return each.asString();
-        }
-    }
-    return "";
-}
-
 std::string alternatives(const Json::Value& values) {
-    std::vector<std::string> texts;
-    for (const Json::Value& each : values) {
-        if (!each.isNull()) {
-            texts.push_back(toJson(each));
-        }
-    }
     std::string words;
-    for (std::size_t i = 0; i < texts.size(); ++i) {
-        words += (i == 0 ? "" : (i + 1 == texts.size() ? " or " : ", ")) + texts[i];
+    for (Json::ArrayIndex i = 0; i < values.size(); ++i) {
+        words += (i == 0 ? "" : (i + 1 == values.size() ? " or " : ", ")) + toJson(values[i]);
     }
     return words;
 }
@@ -46,7 +26,7 @@ std::string wordsFor(const Json::Value& schema) {
     if (schema.isMember("enum")) {
         return alternatives(schema["enum"]);
     }
-    const std::string type = typeOf(schema);
+    const std::string type = schema["type"].asString();
     if (type == "boolean") {
         return "true or false";
     }

@@ -81,8 +81,8 @@ TEST_F(HostRows, EveryWrongFieldIsNamed) {
     }
     const std::map<std::string, std::string> expected{
         {"enable_ftp", "true or false"},
-        {"timeout", "an integer from -2147483648 to 2147483647"},
-        {"utf8_mode", "0, 1 or 2"}};
+        {"timeout", "an integer from 0 to 2147483647"},
+        {"utf8_mode", "an integer from 0 to 2"}};
     EXPECT_EQ(errors, expected);
 }
 
