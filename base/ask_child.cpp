@@ -1,8 +1,7 @@
 #include "base/ask_child.h"
 
-#include "base/unique_fd.h"
+#include "base/pipe.h"
 
-#include <fcntl.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -12,26 +11,24 @@
 namespace velt {
 
 Result<int> askChild(const std::function<int()>& question) {
-    int ends[2];
-    if (::pipe2(ends, O_CLOEXEC) != 0) {
-        return Error(std::string("Cannot make a pipe: ") + std::strerror(errno) + ".");
+    auto pipe = makePipe();
+    if (!pipe) {
+        return pipe.error();
     }
-    const UniqueFd from(ends[0]);
-    UniqueFd to(ends[1]);
     const pid_t child = ::fork();
     if (child == 0) {
         const int answer = question();
-        ::_exit(::write(to.get(), &answer, sizeof answer) == sizeof answer ? 0 : 1);
+        ::_exit(::write(pipe->writeEnd.get(), &answer, sizeof answer) == sizeof answer ? 0 : 1);
     }
     if (child < 0) {
         return Error(std::string("Cannot start a process: ") + std::strerror(errno) + ".");
     }
-    to.reset();
+    pipe->writeEnd.reset();
     // The answer comes by pipe: a process that ignores the end of its children gets no exit status.
     int answer = 0;
     ssize_t got = -1;
     do {
-        got = ::read(from.get(), &answer, sizeof answer);
+        got = ::read(pipe->readEnd.get(), &answer, sizeof answer);
     } while (got < 0 && errno == EINTR);
     while (::waitpid(child, nullptr, 0) < 0 && errno == EINTR) {
     }

@@ -58,6 +58,13 @@ UniqueFd openTemporary(const fs::path& path) {
     }
 }
 
+} // namespace
+
+Error cannot(std::string_view verb, const fs::path& path, int error, SourcePlace where) {
+    return Error("Cannot " + std::string(verb) + " " + path.string() + ": " + std::strerror(error) + ".",
+                 where);
+}
+
 bool writeAll(int fd, std::string_view contents) {
     while (!contents.empty()) {
         const ssize_t written = ::write(fd, contents.data(), contents.size());
@@ -69,13 +76,6 @@ bool writeAll(int fd, std::string_view contents) {
         contents.remove_prefix(static_cast<std::size_t>(written));
     }
     return true;
-}
-
-} // namespace
-
-Error cannot(std::string_view verb, const fs::path& path, int error, SourcePlace where) {
-    return Error("Cannot " + std::string(verb) + " " + path.string() + ": " + std::strerror(error) + ".",
-                 where);
 }
 
 bool isSameFile(int fd, const fs::path& path) {

@@ -28,6 +28,9 @@ Result<std::optional<std::string>> readOptionalFile(const std::filesystem::path&
 /// made when it is missing. After a crash at any moment the old or the new file is there, whole. Thread-safe.
 Result<> replaceFile(const std::filesystem::path& path, std::string_view contents, mode_t mode);
 
+/// Writes all of it. False, with errno set, when that fails.
+bool writeAll(int descriptor, std::string_view contents);
+
 /// Whether the path leads to the opened file, and not to a link or to a file that took its place.
 bool isSameFile(int descriptor, const std::filesystem::path& path);
 

@@ -1,33 +1,22 @@
 #include "standalone/accounts/account_files.h"
 
+#include "base/number_text.h"
+#include "base/text.h"
+
 #include <algorithm>
 #include <array>
-#include <charconv>
+#include <cstdint>
+#include <limits>
 
 namespace velt {
 
 namespace {
 
-/// Cuts the text before the first `separator` off `rest`, which becomes what follows it.
-std::string_view cut(std::string_view& rest, char separator) {
-    const std::size_t end = rest.find(separator);
-    const std::string_view head = rest.substr(0, end);
-    rest = end == std::string_view::npos ? std::string_view{} : rest.substr(end + 1);
-    return head;
-}
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view blanks = " \t\r";
-    const std::size_t first = text.find_first_not_of(blanks);
-    if (first == std::string_view::npos) {
-        return {};
-    }
-    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
-}
-
-template<typename Number> bool parseNumber(std::string_view text, Number& number) {
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    return error == std::errc{} && end == text.data() + text.size();
+/// A user's or a group's number.
+std::optional<std::uint32_t> parseId(std::string_view text) {
+    const auto number = parseNumber(text);
+    const bool fits = number && *number >= 0 && *number <= std::numeric_limits<std::uint32_t>::max();
+    return fits ? std::optional(static_cast<std::uint32_t>(*number)) : std::nullopt;
 }
 
 template<std::size_t count>
@@ -60,12 +49,12 @@ std::vector<UserEntry> parsePasswd(std::string_view text) {
         if (!splitFields(cut(text, '\n'), fields) || !namesAccount(fields[0])) {
             continue;
         }
-        uid_t uid = 0;
-        gid_t gid = 0;
-        if (!parseNumber(fields[2], uid) || !parseNumber(fields[3], gid)) {
+        const auto uid = parseId(fields[2]);
+        const auto gid = parseId(fields[3]);
+        if (!uid || !gid) {
             continue;
         }
-        users.push_back({std::string(fields[0]), uid, gid, std::string(fields[5]), descriptionOf(fields[4]),
+        users.push_back({std::string(fields[0]), *uid, *gid, std::string(fields[5]), descriptionOf(fields[4]),
                          sourceLocal});
     }
     return users;
@@ -78,11 +67,11 @@ std::vector<LocalGroup> parseGroup(std::string_view text) {
         if (!splitFields(cut(text, '\n'), fields) || !namesAccount(fields[0])) {
             continue;
         }
-        gid_t gid = 0;
-        if (!parseNumber(fields[2], gid)) {
+        const auto gid = parseId(fields[2]);
+        if (!gid) {
             continue;
         }
-        LocalGroup group{{std::string(fields[0]), gid, sourceLocal}, {}};
+        LocalGroup group{{std::string(fields[0]), *gid, sourceLocal}, {}};
         std::string_view members = trimmed(fields[3]);
         while (!members.empty()) {
             if (const std::string_view member = trimmed(cut(members, ',')); !member.empty()) {
@@ -103,14 +92,11 @@ UidRange parseLoginDefs(std::string_view text) {
             continue;
         }
         const std::string_view key = line.substr(0, end);
-        uid_t number = 0;
-        if (!parseNumber(trimmed(line.substr(end)), number)) {
-            continue;
-        }
-        if (key == "UID_MIN") {
-            range.first = number;
-        } else if (key == "UID_MAX") {
-            range.last = number;
+        const auto number = parseId(trimmed(line.substr(end)));
+        if (number && key == "UID_MIN") {
+            range.first = *number;
+        } else if (number && key == "UID_MAX") {
+            range.last = *number;
         }
     }
     return range;

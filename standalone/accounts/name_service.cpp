@@ -1,5 +1,6 @@
 #include "standalone/accounts/name_service.h"
 
+#include "base/text.h"
 #include "standalone/accounts/account_files.h"
 
 #include <dlfcn.h>
@@ -7,11 +8,14 @@
 #include <nss.h>
 #include <pwd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <functional>
+#include <iterator>
 #include <limits>
 #include <mutex>
+#include <sstream>
 
 namespace velt {
 
@@ -183,24 +187,14 @@ std::vector<gid_t> NameService::groupsOf(const std::string& user, gid_t primary)
 
 bool nsswitchNames(std::string_view text, std::string_view database, std::string_view service) {
     while (!text.empty()) {
-        const std::size_t end = text.find('\n');
-        std::string_view line = text.substr(0, end);
-        text = end == std::string_view::npos ? std::string_view{} : text.substr(end + 1);
-        line = line.substr(0, line.find('#'));
-        const std::size_t colon = line.find(':');
-        if (colon == std::string_view::npos) {
+        std::string_view line = cut(text, '\n');
+        line = cut(line, '#');
+        if (trimmed(cut(line, ':')) != database) {
             continue;
         }
-        std::string_view key = line.substr(0, colon);
-        key.remove_prefix(std::min(key.find_first_not_of(" \t"), key.size()));
-        if (key.substr(0, key.find_first_of(" \t")) != database) {
-            continue;
-        }
-        std::string words = " " + std::string(line.substr(colon + 1)) + " ";
-        for (char& character : words) {
-            character = character == '\t' ? ' ' : character;
-        }
-        return words.find(" " + std::string(service) + " ") != std::string::npos;
+        std::istringstream words{std::string(line)};
+        return std::find(std::istream_iterator<std::string>(words), {}, service) !=
+               std::istream_iterator<std::string>();
     }
     return false;
 }

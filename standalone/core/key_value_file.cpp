@@ -1,6 +1,7 @@
 #include "standalone/core/key_value_file.h"
 
 #include "base/file.h"
+#include "base/text.h"
 #include "standalone/core/error_number.h"
 
 #include <sys/stat.h>
@@ -12,14 +13,6 @@ namespace velt {
 namespace {
 
 constexpr std::size_t longestValue = 4096;
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view blanks = " \t\r";
-    const auto first = text.find_first_not_of(blanks);
-    if (first == std::string_view::npos)
-        return {};
-    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
-}
 
 std::string_view unquoted(std::string_view value) {
     if (value.size() >= 2 && value.front() == '"' && value.back() == '"')

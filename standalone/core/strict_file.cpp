@@ -2,6 +2,7 @@
 
 #include "base/file.h"
 #include "base/number_text.h"
+#include "base/text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/quoted_text.h"
 
@@ -10,14 +11,6 @@ namespace velt {
 namespace {
 
 constexpr std::string_view versionKey = "version";
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view blanks = " \t\r";
-    const auto first = text.find_first_not_of(blanks);
-    if (first == std::string_view::npos)
-        return {};
-    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
-}
 
 std::string_view withoutComment(std::string_view line) {
     bool quoted = false;

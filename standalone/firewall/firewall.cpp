@@ -1,6 +1,7 @@
 #include "standalone/firewall/firewall.h"
 
 #include "base/file.h"
+#include "base/text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
@@ -32,10 +33,7 @@ std::string firstLine(const std::string& text) {
 }
 
 Error cannotLoad(const ProcessResult& result) {
-    std::string reason = firstLine(result.errors);
-    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
-        reason.pop_back(); // it may be a sentence of its own
-    }
+    std::string reason(trimmedEnd(firstLine(result.errors), ". ")); // it may be a sentence of its own
     if (reason.find("Operation not permitted") != std::string::npos) {
         reason = "this process may not administer the network";
     }

@@ -1,18 +1,13 @@
 #include "standalone/ports/port_range.h"
 
-#include <charconv>
+#include "base/number_text.h"
 
 namespace velt {
 namespace {
 
 std::optional<int> parsePort(std::string_view text) {
-    int port = 0;
-    const char* end = text.data() + text.size();
-    const auto [rest, problem] = std::from_chars(text.data(), end, port);
-    if (problem != std::errc{} || rest != end || port < 1 || port > 65535) {
-        return std::nullopt;
-    }
-    return port;
+    const auto port = parseNumber(text);
+    return port && *port >= 1 && *port <= 65535 ? std::optional(static_cast<int>(*port)) : std::nullopt;
 }
 
 } // namespace

@@ -1,5 +1,7 @@
 #include "standalone/process/last_words.h"
 
+#include "base/text.h"
+
 #include <algorithm>
 #include <array>
 #include <sstream>
@@ -42,11 +44,7 @@ std::string lastWords(const std::string& errors) {
             break;
         }
     }
-    words = withoutPrefix(std::move(words));
-    while (!words.empty() && (words.back() == '\r' || words.back() == ' ' || words.back() == '.')) {
-        words.pop_back();
-    }
-    return words;
+    return std::string(trimmedEnd(withoutPrefix(std::move(words)), "\r ."));
 }
 
 } // namespace velt

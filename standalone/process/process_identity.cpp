@@ -1,11 +1,13 @@
 #include "standalone/process/process_identity.h"
 
+#include "base/number_text.h"
+#include "base/unique_fd.h"
+
 #include <fcntl.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <charconv>
 #include <csignal>
 #include <filesystem>
 #include <fstream>
@@ -90,11 +92,8 @@ std::vector<pid_t> allPids() {
     std::error_code error;
     for (std::filesystem::directory_iterator entry("/proc", error), end; !error && entry != end;
          entry.increment(error)) {
-        const std::string name = entry->path().filename().string();
-        pid_t pid = 0;
-        const auto [rest, problem] = std::from_chars(name.data(), name.data() + name.size(), pid);
-        if (problem == std::errc{} && rest == name.data() + name.size()) {
-            pids.push_back(pid);
+        if (const auto pid = parseNumber(entry->path().filename().string())) {
+            pids.push_back(static_cast<pid_t>(*pid));
         }
     }
     std::sort(pids.begin(), pids.end());
@@ -126,14 +125,10 @@ void signalProcess(const ProcessId& process, int signal) {
     }
     // The descriptor stands for one process for ever. What is compared after it was opened is therefore what
     // the signal reaches, even when the pid changes hands meanwhile.
-    const int descriptor = static_cast<int>(::syscall(SYS_pidfd_open, process.pid, 0));
-    if (descriptor < 0) {
-        return;
+    const UniqueFd descriptor(static_cast<int>(::syscall(SYS_pidfd_open, process.pid, 0)));
+    if (descriptor && isAlive(process)) {
+        ::syscall(SYS_pidfd_send_signal, descriptor.get(), signal, nullptr, 0);
     }
-    if (isAlive(process)) {
-        ::syscall(SYS_pidfd_send_signal, descriptor, signal, nullptr, 0);
-    }
-    ::close(descriptor);
 }
 
 std::vector<ProcessId> descendantsOf(pid_t ancestor) {

@@ -19,7 +19,7 @@ struct ProcessResult {
 /// Runs arguments[0] (an absolute path, or a name looked up in /usr/sbin:/usr/bin:/sbin:/bin) with `input` on
 /// its standard input and a clean environment (PATH, LANG=C.UTF-8), and waits for its end. No shell is
 /// involved. Past `limit` it is killed by its pid. Thread-safe.
-ProcessResult runProcess(const std::vector<std::string>& arguments, std::string_view input = {},
+ProcessResult runProcess(std::vector<std::string> arguments, std::string_view input = {},
                          std::chrono::milliseconds limit = std::chrono::seconds(10));
 
 } // namespace velt

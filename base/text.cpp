@@ -1,0 +1,21 @@
+#include "base/text.h"
+
+namespace velt {
+
+std::string_view trimmed(std::string_view text) {
+    const std::size_t first = text.find_first_not_of(blanks);
+    return first == std::string_view::npos ? std::string_view() : trimmedEnd(text.substr(first), blanks);
+}
+
+std::string_view trimmedEnd(std::string_view text, std::string_view characters) {
+    return text.substr(0, text.find_last_not_of(characters) + 1);
+}
+
+std::string_view cut(std::string_view& rest, char separator) {
+    const std::size_t end = rest.find(separator);
+    const std::string_view head = rest.substr(0, end);
+    rest = end == std::string_view::npos ? std::string_view() : rest.substr(end + 1);
+    return head;
+}
+
+} // namespace velt

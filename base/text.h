@@ -1,0 +1,23 @@
+// Parts of texts.
+#ifndef VELT_BASE_TEXT_H
+#define VELT_BASE_TEXT_H
+
+#include <string_view>
+
+namespace velt {
+
+inline constexpr std::string_view blanks = " \t\r";
+
+/// The text without the blanks at its ends.
+std::string_view trimmed(std::string_view text);
+
+/// The text without those of the characters that it ends in.
+std::string_view trimmedEnd(std::string_view text, std::string_view characters);
+
+/// Cuts the text before the first `separator` off `rest`, which becomes what follows it; "" when nothing
+/// does.
+std::string_view cut(std::string_view& rest, char separator);
+
+} // namespace velt
+
+#endif

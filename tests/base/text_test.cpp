@@ -1,0 +1,29 @@
+#include "base/text.h"
+
+#include <gtest/gtest.h>
+
+namespace velt {
+namespace {
+
+TEST(Text, IsTrimmedAtItsEnds) {
+    EXPECT_EQ(trimmed(" \t a b\r "), "a b");
+    EXPECT_EQ(trimmed("a"), "a");
+    EXPECT_EQ(trimmed(" \t"), "");
+    EXPECT_EQ(trimmed(""), "");
+    EXPECT_EQ(trimmedEnd(" a.b. .", ". "), " a.b");
+    EXPECT_EQ(trimmedEnd("...", "."), "");
+    EXPECT_EQ(trimmedEnd("", "."), "");
+}
+
+TEST(Text, IsCutAtASeparator) {
+    std::string_view rest = "a,,b";
+    EXPECT_EQ(cut(rest, ','), "a");
+    EXPECT_EQ(rest, ",b");
+    EXPECT_EQ(cut(rest, ','), "");
+    EXPECT_EQ(cut(rest, ','), "b");
+    EXPECT_EQ(rest, "");
+    EXPECT_EQ(cut(rest, ','), "");
+}
+
+} // namespace
+} // namespace velt
