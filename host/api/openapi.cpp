@@ -86,8 +86,7 @@ OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>(
     if (!document) {
         throw std::runtime_error("The description of the API is damaged: " + document.error().message + ".");
     }
-    document_ = std::move(*document);
-    const Json::Value& paths = document_["paths"];
+    const Json::Value& paths = (*document)["paths"];
     for (const std::string& path : paths.getMemberNames()) {
         const Json::Value request = flatSchema(document_, paths[path]["post"]["requestBody"]);
         if (!request.isObject()) {
@@ -102,10 +101,6 @@ OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>(
 }
 
 OpenApi::~OpenApi() = default;
-
-bool OpenApi::describes(const Row& row) const {
-    return schemas_->byPath.contains(pathOf(row));
-}
 
 std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& parameters) const {
     std::vector<FieldError> errors;

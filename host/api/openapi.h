@@ -26,9 +26,6 @@ public:
     /// The document's text.
     const std::string& text() const { return text_; }
 
-    /// Whether the document describes the row's parameters.
-    bool describes(const Row& row) const;
-
     /// The parameters that do not match the row's schema, and what it expects of each. This only explains:
     /// the module decides whether a request is accepted.
     std::vector<FieldError> explain(const Row& row, const Json::Value& parameters) const;
@@ -37,7 +34,6 @@ private:
     struct Schemas;
 
     std::string text_;
-    Json::Value document_;
     std::unique_ptr<Schemas> schemas_;
 };
 

@@ -31,7 +31,7 @@ std::string commonHead(int status) {
 } // namespace
 
 const char* reasonPhrase(int status) {
-    static constexpr std::array<std::pair<int, const char*>, 20> phrases{{
+    static constexpr std::array<std::pair<int, const char*>, 18> phrases{{
         {200, "OK"},
         {201, "Created"},
         {204, "No Content"},
@@ -44,14 +44,12 @@ const char* reasonPhrase(int status) {
         {409, "Conflict"},
         {412, "Precondition Failed"},
         {413, "Content Too Large"},
-        {417, "Expectation Failed"},
         {422, "Unprocessable Content"},
         {431, "Request Header Fields Too Large"},
         {500, "Internal Server Error"},
         {501, "Not Implemented"},
         {503, "Service Unavailable"},
         {505, "HTTP Version Not Supported"},
-        {507, "Insufficient Storage"},
     }};
     const auto* const found = std::find_if(phrases.begin(), phrases.end(),
                                            [status](const auto& each) { return each.first == status; });

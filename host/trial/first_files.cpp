@@ -76,7 +76,7 @@ void makeFirstFiles(const std::filesystem::path& place) {
     } else {
         makeDemoUser(place);
     }
-    // The last, since it tells that all of them are there.
+    // Last: it shows that all of them exist.
     check(replaceFile(sharesFile, sharesText(place, root ? "ftp" : userName(::geteuid())), 0644));
 }
 

@@ -1,4 +1,4 @@
-// What a trial tells about itself.
+// Says where everything of a trial is.
 #ifndef VELT_HOST_TRIAL_REPORT_H
 #define VELT_HOST_TRIAL_REPORT_H
 
@@ -8,8 +8,8 @@
 
 namespace velt::host {
 
-/// Prints where everything is, and what to try; to standard error what does not work. `folder` is the trial's
-/// as it was named, with a slash. Throws TrialError.
+/// Prints where everything is and what to try, and to standard error what does not work. `folder` is the name
+/// of the trial's folder, with a slash. Throws TrialError.
 void report(const VeltdClient& client, const std::string& folder, const std::string& url,
             const std::string& token);
 

@@ -1,4 +1,4 @@
-// Makes a veltd that runs one to try.
+// Sets up the running veltd of a trial.
 #ifndef VELT_HOST_TRIAL_SET_UP_H
 #define VELT_HOST_TRIAL_SET_UP_H
 
@@ -9,19 +9,19 @@
 
 namespace velt::host {
 
-/// In the trial's folder, which is the working folder for all of these.
+/// In the working folder, which is the trial's for all of these functions.
 inline constexpr const char* tokenName = "token";
 inline constexpr const char* environmentName = "env";
 
-/// The trial's token, made anew when there is none that veltd knows; the client shows it from then on. Throws
+/// The trial's token. Makes one unless veltd accepts the stored one; the client sends it from then on. Throws
 /// TrialError.
 std::string provideToken(VeltdClient& client);
 
-/// The settings of a new trial: ports that are free and need no rights, and as root the demo share for
+/// Makes the settings of a new trial: free ports that need no privileges, and as root the demo share for
 /// anonymous users. Throws TrialError.
 void makeFirstSettings(const VeltdClient& client);
 
-/// Writes what a shell takes over to use veltctl. Throws TrialError.
+/// Writes the file that sets up a shell for veltctl. Throws TrialError.
 void writeEnvironment(const std::string& url, const std::string& token,
                       const std::filesystem::path& programs);
 

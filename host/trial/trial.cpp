@@ -20,7 +20,7 @@ namespace {
 
 constexpr int usageError = 2;
 
-/// Starts veltd unless it runs already as it was built last, and leaves it answering.
+/// Starts veltd, unless one of the latest build is running, and waits until it answers.
 void provideVeltd(const TrialFolder& folder, const TrialPlace& place, TrialRecord& record) {
     const std::string build = buildOf(programFolder());
     auto process = runningVeltd();
@@ -36,14 +36,14 @@ void provideVeltd(const TrialFolder& folder, const TrialPlace& place, TrialRecor
     }
     linkPrograms();
     makeFirstFiles(place.root);
-    // Known before veltd runs, so that nobody has to ask a start that was interrupted.
+    // Stored before veltd runs, so that it is there if the start is interrupted.
     record = {place.root, chooseHttpPort(record.httpPort), build, record.setUp};
     folder.store(record);
     const pid_t started = launchVeltd(folder.path(), place, record.httpPort);
     std::printf("veltd runs, as process %d.\n", static_cast<int>(started));
 }
 
-/// Who became root for this start alone goes on as before.
+/// A user who became root by sudo gets what is needed to go on without it.
 void giveToCaller() {
     const char* const user = std::getenv("SUDO_UID"); // NOLINT(concurrency-mt-unsafe)
     if (user == nullptr || ::geteuid() != 0) {
@@ -83,7 +83,7 @@ void start(const TrialFolder& folder) {
 
 int runTrial(const std::vector<std::string>& words) {
     ::umask(022);
-    std::setvbuf(stdout, nullptr, _IOLBF, 0); // in order with what goes to standard error
+    std::setvbuf(stdout, nullptr, _IOLBF, 0); // keeps the order with standard error
     try {
         if (words.size() == 2 && words[0] == "start") {
             start(TrialFolder::forStart(words[1]));

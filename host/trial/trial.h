@@ -1,4 +1,4 @@
-// veltd trial: a veltd of one's own, with all of its state and a demo share below one folder.
+// veltd trial: a veltd for one folder, which holds all of its state and a demo share.
 #ifndef VELT_HOST_TRIAL_TRIAL_H
 #define VELT_HOST_TRIAL_TRIAL_H
 
@@ -7,8 +7,7 @@
 
 namespace velt::host {
 
-/// Does what the words after "veltd trial" say: "start FOLDER" or "stop FOLDER". Returns the program's exit
-/// status.
+/// Runs "veltd trial" with the words that follow: "start FOLDER" or "stop FOLDER". Returns the exit status.
 int runTrial(const std::vector<std::string>& words);
 
 } // namespace velt::host

@@ -50,7 +50,7 @@ TrialFolder::TrialFolder(const std::filesystem::path& folder, bool forStop)
     if (::chdir(path_.c_str()) != 0) {
         throw TrialError("Cannot enter " + name_ + ": " + systemError() + ".");
     }
-    // Only read, so that another user's can be opened, too, and named.
+    // Read-only, so that another user's can be opened, too.
     lock_ = UniqueFd(::open(lockFile, O_RDONLY | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644));
     struct stat status {};
     if (!lock_ || ::fstat(lock_.get(), &status) != 0) {

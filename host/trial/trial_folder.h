@@ -1,4 +1,4 @@
-// The folder of a trial, its lock, and what is known of its veltd.
+// The folder of a trial, its lock, and its record.
 #ifndef VELT_HOST_TRIAL_TRIAL_FOLDER_H
 #define VELT_HOST_TRIAL_TRIAL_FOLDER_H
 
@@ -9,20 +9,20 @@
 
 namespace velt::host {
 
-/// What a trial has stored about itself.
+/// What is stored about a trial.
 struct TrialRecord {
     std::filesystem::path place; ///< the state root as veltd sees it; "" for a new trial
     int httpPort = 0;            ///< 0 for a new trial
-    std::string build;           ///< tells the programs that were started from all others
-    bool setUp = false;          ///< its first settings were made
+    std::string build;           ///< identifies the programs that were started
+    bool setUp = false;          ///< its first settings are made
 };
 
-/// Held while a trial is started or stopped: one at a time. The working folder is the trial's meanwhile, so
-/// that the names in it are short enough for a socket, wherever it is.
+/// The trial while it is started or stopped, which its lock allows one process at a time. Makes the folder
+/// the working folder, so that the name of the socket is short enough wherever the folder is.
 class TrialFolder {
 public:
-    /// Makes the folder when it is missing, and waits for others that start or stop the trial. Throws
-    /// TrialError, also for a trial of another user; root may stop those.
+    /// Waits while others start or stop the trial. A start makes a missing folder. Throws TrialError, also
+    /// when the trial is another user's, which only root may stop.
     static TrialFolder forStart(const std::filesystem::path& folder);
     static TrialFolder forStop(const std::filesystem::path& folder);
 

@@ -16,10 +16,10 @@ namespace velt::host {
 
 namespace {
 
-constexpr const char* viewMount = "/media";
-constexpr const char* viewRoot = "/media/velt";
+constexpr const char* mountPoint = "/media";
+constexpr const char* mountedRoot = "/media/velt";
 
-/// Whether the test holds in a process of its own, which it may change.
+/// Runs the test in a child process, which it may change.
 bool holdsInChild(const std::function<bool()>& test) {
     const pid_t child = ::fork();
     if (child == 0) {
@@ -58,12 +58,12 @@ TrialPlace findPlace(const std::filesystem::path& folder) {
                          ": a folder on the way is closed.\nMove this tree to a folder that everybody may "
                          "enter, such as /srv, and start again.");
     }
-    return {viewRoot, true};
+    return {mountedRoot, true};
 }
 
-bool enterView(const std::filesystem::path& folder, const TrialPlace& place) {
+bool mountPlace(const std::filesystem::path& folder, const TrialPlace& place) {
     return ::unshare(CLONE_NEWNS) == 0 && ::mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
-           ::mount("velt", viewMount, "tmpfs", 0, "mode=755") == 0 &&
+           ::mount("velt", mountPoint, "tmpfs", 0, "mode=755") == 0 &&
            ::mkdir(place.root.c_str(), 0755) == 0 &&
            ::mount(folder.c_str(), place.root.c_str(), nullptr, MS_BIND, nullptr) == 0;
 }

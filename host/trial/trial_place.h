@@ -6,22 +6,21 @@
 
 namespace velt::host {
 
-/// Anonymous users are served by the account ftp. Where that one cannot get to the trial's folder, as below a
-/// home folder, veltd gets a view of its own of the machine, with the folder at a place that everybody can
-/// get to.
+/// The account ftp serves anonymous users. If it cannot get to the trial's folder, for example below a home
+/// folder, veltd runs with mounts of its own in which the folder is at a place that everybody can enter.
 struct TrialPlace {
     std::filesystem::path root; ///< the state root, as veltd sees it
-    bool needsView = false;
+    bool needsMounts = false;
 };
 
-/// Throws TrialError when the folder, or the account, cannot be used.
+/// Throws TrialError when the account is missing or cannot get there either way.
 TrialPlace findPlace(const std::filesystem::path& folder);
 
-/// Whether this process may mount in a view of its own.
+/// Whether this process may have mounts of its own.
 bool mayMount();
 
-/// Gives this process the view in which the folder is at the place. False, with errno, on failure.
-bool enterView(const std::filesystem::path& folder, const TrialPlace& place);
+/// Gives this process mounts of its own, with the folder at the place. False, with errno, on failure.
+bool mountPlace(const std::filesystem::path& folder, const TrialPlace& place);
 
 } // namespace velt::host
 

@@ -24,7 +24,7 @@
 #include <thread>
 #include <vector>
 
-extern "C" { // which the header of glibc 2.36 forgets
+extern "C" { // missing in the header of glibc 2.36
 #include <sys/pidfd.h>
 }
 
@@ -76,22 +76,22 @@ void waitForAnswer(const std::function<bool()>& runs) {
     }
 }
 
-/// What becomes veltd: a process that nobody who ends this one ends with it.
+/// Becomes veltd, in a session of its own: what ends the starting process does not end it.
 [[noreturn]] void becomeVeltd(const std::filesystem::path& folder, const TrialPlace& place, int httpPort) {
     ::setsid();
     const int log = ::open(logName, O_WRONLY | O_CREAT | O_TRUNC | O_NOFOLLOW | O_CLOEXEC, 0644);
     ::dup2(::open("/dev/null", O_RDWR | O_CLOEXEC), STDIN_FILENO);
     ::dup2(log, STDOUT_FILENO);
     ::dup2(log, STDERR_FILENO);
-    // The lock goes on with the new program. Until that runs, the lock of the start is held, too: whoever
-    // waits for that one finds this process afterwards.
+    // veltd keeps the lock. Until it runs, this process also holds the trial's lock, so whoever waits for
+    // that finds veltd afterwards.
     const auto lock = InstanceLock::take(".");
     if (!lock) {
         std::fprintf(stderr, "%s\n", lock.error().message.c_str());
         ::_exit(1);
     }
     lock->keepOverExec();
-    if (place.needsView && !enterView(folder, place)) {
+    if (place.needsMounts && !mountPlace(folder, place)) {
         std::fprintf(stderr, "Cannot mount %s: %s.\n", place.root.c_str(), systemError().c_str());
         ::_exit(1);
     }
@@ -110,7 +110,7 @@ void waitForAnswer(const std::function<bool()>& runs) {
 void endVeltd(pid_t process) {
     constexpr int longestEnd = 70'000;
     const UniqueFd handle(::pidfd_open(process, 0));
-    // Behind the handle it is this process and no later one of its number.
+    // The handle is of this process, and not of a later one with the same number, if it still holds the lock.
     if (!handle || runningVeltd() != process) {
         return;
     }

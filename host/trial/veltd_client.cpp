@@ -15,7 +15,7 @@ namespace velt::host {
 
 namespace {
 
-/// A change waits for daemons to end and to start.
+/// A change may wait for daemons to end and start.
 constexpr timeval longestWait{100, 0};
 
 bool sendAll(int descriptor, std::string_view text) {
@@ -39,7 +39,7 @@ std::string receiveAll(int descriptor) {
     return text;
 }
 
-/// Of an answer that ended with its connection; without status when it is not whole.
+/// Without status when the text is not a complete answer.
 Reply parseReply(const std::string& text) {
     constexpr std::string_view version = "HTTP/1.1 ";
     const std::size_t head = text.find("\r\n\r\n");

@@ -1,4 +1,4 @@
-// Requests to a veltd of this machine.
+// Requests to veltd over its Unix socket.
 #ifndef VELT_HOST_TRIAL_VELTD_CLIENT_H
 #define VELT_HOST_TRIAL_VELTD_CLIENT_H
 
@@ -17,12 +17,11 @@ struct Reply {
     bool good() const { return status >= 200 && status < 300; }
 };
 
-/// Speaks to the Unix socket at the path.
 class VeltdClient {
 public:
     explicit VeltdClient(std::string socketPath) : socketPath_(std::move(socketPath)) {}
 
-    /// Shows this token from now on; "" for none.
+    /// Sends this token from now on; "" for none.
     void setToken(std::string token) { token_ = std::move(token); }
 
     /// Throws TrialError when there is no answer.
