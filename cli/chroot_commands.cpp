@@ -55,7 +55,7 @@ void replaceRules(Context& context, const RuleOptions& options) {
                       "Correct them; 'veltctl chroot rules load --json' shows how rules are written.",
                       faults);
     }
-    context.api.changeWhatWasRead([&] { saveRules(context.api, rules, loadRules(context.api)); });
+    context.api.changeWhatWasRead([&] { storeRules(context.api, rules, loadRules(context.api)); });
     writeRules(context, rules);
 }
 
@@ -70,7 +70,7 @@ void addRule(Context& context, const RuleOptions& options) {
         rules = before;
         if (std::find(rules.begin(), rules.end(), options.rule) == rules.end()) {
             rules.push_back(options.rule);
-            saveRules(context.api, rules, before);
+            storeRules(context.api, rules, before);
         }
     });
     writeRules(context, rules);
@@ -96,7 +96,7 @@ void removeRule(Context& context, const RuleOptions& options) {
     context.api.changeWhatWasRead([&] {
         const ChrootRules before = loadRules(context.api);
         rules = rulesWithout(before, options.rule);
-        saveRules(context.api, rules, before);
+        storeRules(context.api, rules, before);
     });
     writeRules(context, rules);
 }

@@ -25,7 +25,7 @@ std::optional<std::string> faultIn(const Json::Value& object) {
     return faultOf(ruleFromJson(object));
 }
 
-void store(ApiClient& api, const ChrootRules& rules) {
+void replaceRules(ApiClient& api, const ChrootRules& rules) {
     Json::Value parameters;
     parameters["rules"] = rulesToJson(rules);
     api.call(saveMethod, parameters);
@@ -91,8 +91,8 @@ ChrootRules loadRules(ApiClient& api) {
     return rules;
 }
 
-void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before) {
-    store(api, rules);
+void storeRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before) {
+    replaceRules(api, rules);
     const ChrootRules stored = loadRules(api);
     Failure dropped(ExitCode::refused,
                     "The server does not know the user or group of a rule, or does not accept its folder.",
@@ -103,7 +103,7 @@ void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& befo
         }
     }
     if (!dropped.notes().empty()) {
-        store(api, before);
+        replaceRules(api, before);
         dropped.note("The rules are as they were before.");
         throw Failure(dropped);
     }

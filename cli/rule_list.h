@@ -38,7 +38,7 @@ ChrootRules loadRules(ApiClient& api);
 /// Stores the rules in place of all stored ones, which are `before`, and loads them again, since the server
 /// leaves out rules that it does not accept. Then `before` is stored again, and Failure (refused) names the
 /// rules that were left out.
-void saveRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before);
+void storeRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before);
 
 } // namespace velt::cli
 

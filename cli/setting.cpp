@@ -28,7 +28,7 @@ Json::Value parseBoolean(const std::string& word) {
     return {};
 }
 
-// Null for a text that is not of the type.
+// Null when the word is not a value of the type.
 Json::Value parseValue(const std::string& word, SettingType type) {
     switch (type) {
     case SettingType::boolean:
@@ -135,7 +135,7 @@ Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::s
                           std::string("Known keys: ") + group.keys() + ".");
         }
         if (result.isMember(key)) {
-            throw Failure(ExitCode::usage, "\"" + key + "\" is given twice.", "Give each key once.");
+            throw Failure(ExitCode::usage, "Duplicate key " + key + ".", "Name each key once.");
         }
         const Json::Value value = parseValue(word.substr(equals + 1), setting->type);
         if (!isValid(value, *setting)) {
@@ -143,7 +143,7 @@ Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::s
         }
         if (key == "custom_port" && value.asString().empty()) {
             throw Failure(ExitCode::usage, "custom_port cannot be empty.",
-                          "Give FIRST:LAST, or custom_port_range=off for the default range.");
+                          "Use FIRST:LAST, or custom_port_range=off for the default range.");
         }
         result[key] = value;
     }
@@ -160,7 +160,7 @@ Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted,
     if (group.find("custom_port") != nullptr) {
         completePassiveRange(change, current);
     }
-    // The server takes no empty address, but one that is blank it keeps as none.
+    // The server refuses an empty address, but stores a blank one as none.
     if (change.isMember("ext_ip") && change["ext_ip"].asString().empty()) {
         change["ext_ip"] = " ";
     }

@@ -43,12 +43,12 @@ bool isValid(const Json::Value& value, const Setting& setting);
 /// "timeout: expected a number from 0 to 86400".
 std::string expectationOf(const Setting& setting);
 
-/// The object that words of the form key=value name. Throws Failure (usage) for a word of another form, an
-/// unknown key, a key named twice, or a value that the setting cannot have.
+/// The object that words such as "portnum=2121" name. Failure (usage) for any other word, an unknown key, a
+/// key named twice, or a value that the setting cannot have.
 Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::string>& words);
 
-/// The parameters for a "set" that changes what `wanted` names: with the required keys at their current
-/// values, and with the keys that the wanted ones have no effect without.
+/// The parameters for a "set" that changes what `wanted` names: also the required keys, with their current
+/// values, and the keys without which the wanted ones have no effect.
 Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted, const Json::Value& current);
 
 } // namespace velt::cli

@@ -19,7 +19,7 @@ std::vector<SettingGroup> groupsInOrder() {
     return {securitySettings(), ftpSettings(), sftpSettings()};
 }
 
-// Whether a passive range of the form FIRST:LAST has the port.
+// Whether the port lies in a passive range such as "55536:55899".
 bool inRange(const std::string& range, int port) {
     int first = 0;
     int last = 0;
@@ -32,7 +32,7 @@ bool inRange(const std::string& range, int port) {
     return first <= port && port <= last;
 }
 
-// A port that SFTP holds now and gives up in the document is free for FTP only after SFTP has moved.
+// A port that the document moves from SFTP to FTP is free only after SFTP has moved.
 bool sftpMovesFirst(ApiClient& api, const Json::Value& document) {
     if (!document.isMember("ftp") || !document.isMember("sftp")) {
         return false;
@@ -44,7 +44,7 @@ bool sftpMovesFirst(ApiClient& api, const Json::Value& document) {
     return inWay && document["sftp"]["portnum"].isInt() && document["sftp"]["portnum"] != port;
 }
 
-// Only what is known: a key of a newer server would make the document one that cannot be imported.
+// Only known keys: a document with those of a newer server could not be imported.
 Json::Value knownSettings(const SettingGroup& group, const Json::Value& current) {
     Json::Value section(Json::objectValue);
     for (const Setting& setting : group.settings) {
@@ -57,14 +57,14 @@ Json::Value knownSettings(const SettingGroup& group, const Json::Value& current)
 
 void checkSection(const SettingGroup& group, const Json::Value& section, std::vector<std::string>& faults) {
     if (!section.isObject()) {
-        faults.push_back(std::string(group.command) + ": an object is expected");
+        faults.push_back(std::string(group.command) + ": expected an object");
         return;
     }
     for (const std::string& key : section.getMemberNames()) {
         const std::string name = std::string(group.command) + "." + key;
         const Setting* setting = group.find(key);
         if (setting == nullptr) {
-            faults.push_back(name + ": unknown; known are " + group.keys());
+            faults.push_back(name + ": unknown; known keys are " + group.keys());
         } else if (!isValid(section[key], *setting)) {
             faults.push_back(group.command + ("." + expectationOf(*setting)));
         }
@@ -80,12 +80,12 @@ void checkTop(const Json::Value& document, std::vector<std::string>& faults) {
                                                    "security", rulesSection,     "sftp"};
     for (const std::string& name : document.getMemberNames()) {
         if (std::find(known.begin(), known.end(), name) == known.end()) {
-            faults.push_back(name + ": unknown");
+            faults.push_back(name + ": unknown section");
         }
     }
 }
 
-// The default passive range is shown beside a switch that is off; it is no setting then.
+// While its switch is off, the server shows the default passive range, which nobody has set.
 void dropIdlePassiveRange(Json::Value& wanted, const Json::Value& section, const Json::Value& current) {
     const Json::Value& range =
         section.isMember("custom_port_range") ? section["custom_port_range"] : current["custom_port_range"];
@@ -184,7 +184,7 @@ void planRules(ApiClient& api, const Json::Value& array, ImportPlan& plan) {
         step.changes.emplace_back("another order of the same rules");
     }
     step.changesJson.append(changeToJson({"rules", rulesToJson(current), rulesToJson(wanted)}));
-    step.apply = [&api, wanted] { api.changeWhatWasRead([&] { saveRules(api, wanted, loadRules(api)); }); };
+    step.apply = [&api, wanted] { api.changeWhatWasRead([&] { storeRules(api, wanted, loadRules(api)); }); };
     plan.steps.push_back(std::move(step));
 }
 
@@ -204,7 +204,7 @@ Json::Value exportSettings(ApiClient& api) {
 std::vector<std::string> documentFaults(const Json::Value& document) {
     std::vector<std::string> faults;
     if (!document.isObject()) {
-        faults.emplace_back("an object is expected");
+        faults.emplace_back("expected an object");
         return faults;
     }
     checkTop(document, faults);

@@ -1,4 +1,4 @@
-// One JSON document with all settings, and what it takes to bring a server to its state.
+// One JSON document with all settings, and how to apply it to a server.
 #ifndef VELT_CLI_SETTINGS_DOCUMENT_H
 #define VELT_CLI_SETTINGS_DOCUMENT_H
 
@@ -6,12 +6,12 @@
 
 namespace velt::cli {
 
-/// The whole of a server's settings, services that are switched on and down as switched on: "format",
-/// "format_version", "chroot_rules", "security", "ftp", "sftp".
+/// All settings of a server: "format", "format_version", "chroot_rules", "security", "ftp", "sftp". A service
+/// that is switched on but down is written as on.
 Json::Value exportSettings(ApiClient& api);
 
-/// Every fault of a document, in words; none: it can be imported. Sections and keys may be absent, but none
-/// may be unknown.
+/// Every fault of a document, in words; a document without faults can be imported. Sections and keys may be
+/// missing, but not unknown.
 std::vector<std::string> documentFaults(const Json::Value& document);
 
 /// What one section of a document changes.
@@ -23,7 +23,7 @@ struct ImportStep {
 };
 
 struct ImportPlan {
-    /// Confinement first, the services last: nothing opens before its limits are in force.
+    /// Confinement first, services last: nothing opens before its limits are in force.
     std::vector<ImportStep> steps;
 };
 

@@ -169,7 +169,7 @@ TEST_F(DocumentTest, EveryFaultOfADocumentIsNamedAndNothingIsAsked) {
     EXPECT_EQ(result.code, 3);
     for (const char* fault :
          {"format: expected", "smb: unknown", "ftp.portnum: expected a number from 1 to 65535",
-          "ftp.port: unknown", "ftp.enable_ftp: expected on or off", "security: an object",
+          "ftp.port: unknown", "ftp.enable_ftp: expected on or off", "security: expected an object",
           "chroot_rules: rule 1:"}) {
         EXPECT_NE(result.err.find(fault), std::string::npos) << fault << "\n" << result.err;
     }
