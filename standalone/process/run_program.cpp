@@ -3,7 +3,7 @@
 #include "base/file.h"
 #include "base/input_wait.h"
 #include "base/pipe.h"
-#include "base/spawn.h"
+#include "base/spawning.h"
 
 #include <poll.h>
 #include <signal.h>

@@ -1,4 +1,4 @@
-#include "base/spawn.h"
+#include "base/spawning.h"
 
 #include "base/file.h"
 

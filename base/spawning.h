@@ -1,6 +1,6 @@
 // Starting programs.
-#ifndef VELT_BASE_SPAWN_H
-#define VELT_BASE_SPAWN_H
+#ifndef VELT_BASE_SPAWNING_H
+#define VELT_BASE_SPAWNING_H
 
 #include "base/result.h"
 
