@@ -80,8 +80,8 @@ HttpLimits possibleLimits(const Config& config, HostLog& log) {
 }
 
 void serve(const Config& config, const sigset_t& signals, HostLog& log) {
-    if (velt::openState(config.stateRoot) < 0) {
-        throw velt::host::ConfigError(velt::lastErrorSentence());
+    if (const auto opened = velt::openState(config.stateRoot); !opened) {
+        throw velt::host::ConfigError(opened.error().message);
     }
     velt::host::ModuleTable table;
     for (const auto& module : config.modules) {
@@ -94,11 +94,11 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     App app(settings, table, log);
     HttpServer server(app, possibleLimits(config, log), config.tls);
     const Json::Value ready = listenEverywhere(config, server, log);
-    if (velt::startEnabledServices() < 0) {
-        log.write("not every enabled service started: " + velt::lastErrorSentence());
+    if (const auto started = velt::startEnabledServices(); !started) {
+        log.write("not every enabled service started: " + started.error().message);
     }
-    if (velt::watchServices() < 0) {
-        log.write("cannot watch the services: " + velt::lastErrorSentence());
+    if (const auto watched = velt::watchServices(); !watched) {
+        log.write("cannot watch the services: " + watched.error().message);
     }
     server.start(config.ioThreads);
     if (config.printReady) {

@@ -5,19 +5,18 @@
 // after a failure lastErrorSentence or lastPortConflict for the answer. A change that was accepted is in
 // force when servicesDown is empty after it.
 //
-// Functions with an int result return a negative one on failure, with the last error set. Unless it says
-// otherwise a function may be called from any thread.
+// Unless it says otherwise a function may be called from any thread.
 #ifndef VELT_STANDALONE_STANDALONE_H
 #define VELT_STANDALONE_STANDALONE_H
 
 // Taking a state root into use, starting and watching what is enabled.
 #include "standalone/control/open_state.h"
 #include "standalone/control/service_watch.h"
-#include "standalone/control/services.h"
+#include "standalone/control/start_services.h"
 
-// What is down, and who holds a port.
-#include "standalone/control/port_conflict.h"
-#include "standalone/control/services_down.h"
+// Which services there are, which are down, and who holds a port.
+#include "standalone/contract/last_port_conflict.h"
+#include "standalone/control/service_overview.h"
 
 // On whose behalf, what happened, and what was written down.
 #include "standalone/journal/admin_log.h"

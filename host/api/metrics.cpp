@@ -115,8 +115,9 @@ Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events)
                 for (const Service& each : listServices(table, call.principal)) {
                     metrics.setService(each.name, each.wanted.value_or(true), each.running);
                 }
-                metrics.setDaemonRestarts("ftp", daemonRestarts("ftpd"));
-                metrics.setDaemonRestarts("sftp", daemonRestarts("sftp"));
+                for (const auto& [daemon, count] : daemonRestarts()) {
+                    metrics.setDaemonRestarts(daemon, count);
+                }
                 metrics.setEventReaders(events.readers());
                 return HttpResponse{200, "text/plain; version=0.0.4; charset=utf-8", metrics.text(), {}};
             }};

@@ -88,7 +88,7 @@ OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>(
     }
     const Json::Value& paths = (*document)["paths"];
     for (const std::string& path : paths.getMemberNames()) {
-        const Json::Value request = flatSchema(document_, paths[path]["post"]["requestBody"]);
+        const Json::Value request = flatSchema(*document, paths[path]["post"]["requestBody"]);
         if (!request.isObject()) {
             continue;
         }

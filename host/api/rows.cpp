@@ -95,7 +95,7 @@ std::vector<ServiceDown> Rows::startWhatIsDown(const Principal& principal) {
         return down;
     }
     PlatformRequest platform(principal.actor, principal.address);
-    startEnabledServices(); // servicesDown tells what failed
+    (void)startEnabledServices(); // servicesDown tells what failed
     countStarts(platform.finish());
     return servicesDown();
 }

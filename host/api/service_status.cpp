@@ -1,8 +1,6 @@
 #include "host/api/service_status.h"
 
-#include "ftp/ftp_library.h"
 #include "host/module/module_call.h"
-#include "platform/sftp.h"
 
 #include <algorithm>
 #include <array>
@@ -11,40 +9,18 @@ namespace velt::host {
 
 namespace {
 
-/// Which services the stored settings ask for. The answer of "get" may be the state of this moment, but every
-/// "set" has to name the wanted one: a client that changes a single setting needs to know what is stored, or
-/// it would switch off a service that is just down.
-struct StoredSwitches {
-    bool ftp = false;
-    bool ftps = false;
-    bool sftp = false;
-};
-
-/// Nothing when the platform cannot read one of the settings.
-std::optional<StoredSwitches> readStoredSwitches() {
-    _tag_VELT_FTP_CONF_ ftp{};
-    _tag_VELT_SFTP_CONFIG_ sftp{};
-    if (VELTFTPConfGet(&ftp) < 0 || VELTSFTPConfigGet(1, &sftp) < 0) {
-        return std::nullopt;
-    }
-    return StoredSwitches{(ftp.service_flags & VELT_FTP_SERVICE_PLAIN) != 0,
-                          (ftp.service_flags & VELT_FTP_SERVICE_TLS) != 0, sftp.enable != 0};
-}
-
-/// Which row tells about a service, and how the platform names its daemon.
+/// Which row tells about a service.
 struct Place {
-    const char* name;
+    std::string_view service;
     const char* api;
     int version;
     const char* switchKey;
-    const char* daemon;
-    bool StoredSwitches::*wanted;
 };
 
 constexpr std::array<Place, 3> places{{
-    {"ftp", "VELT.Core.FileServ.FTP", 3, "enable_ftp", "ftp", &StoredSwitches::ftp},
-    {"ftps", "VELT.Core.FileServ.FTP", 3, "enable_ftps", "ftp", &StoredSwitches::ftps},
-    {"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, "enable", "sftp", &StoredSwitches::sftp},
+    {"ftp", "VELT.Core.FileServ.FTP", 3, "enable_ftp"},
+    {"ftps", "VELT.Core.FileServ.FTP", 3, "enable_ftps"},
+    {"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, "enable"},
 }};
 
 /// The row's answer; null when it fails.
@@ -54,19 +30,46 @@ Json::Value settingsOf(const Row& row, const Principal& principal) {
     return good ? outcome.data : Json::Value();
 }
 
-Service describe(const Place& place, const Json::Value& settings, const std::optional<StoredSwitches>& stored,
-                 const std::vector<ServiceDown>& down) {
-    Service service;
-    service.name = place.name;
-    if (settings.isObject()) {
-        service.enabled = settings[place.switchKey];
-        service.port = settings["portnum"];
+/// Tells what the modules answer about the services, and what is stored of a service without a module. The
+/// answer of "get" may be the state of this moment, but every "set" has to name the wanted one: a client that
+/// changes a single setting needs to know what is stored, or it would switch off a service that is just down.
+class Teller {
+public:
+    Teller(const ModuleTable& table, const Principal& principal) : table_(table), principal_(principal) {}
+
+    /// Empty when the service's module is not loaded.
+    std::optional<Service> tell(const StoredService& stored) {
+        Service service{stored.name, {}, {}, stored.enabled, false, ""};
+        const auto place = std::ranges::find(places, stored.name, &Place::service);
+        if (place == places.end()) {
+            service.enabled = stored.enabled ? Json::Value(*stored.enabled) : Json::Value();
+            service.port = stored.port ? Json::Value(*stored.port) : Json::Value();
+            return service;
+        }
+        const Row* const row = table_.find(place->api, place->version, "get");
+        if (row == nullptr) {
+            return std::nullopt;
+        }
+        if (row != former_) {
+            settings_ = settingsOf(*row, principal_);
+            former_ = row;
+        }
+        if (settings_.isObject()) {
+            service.enabled = settings_[place->switchKey];
+            service.port = settings_["portnum"];
+        }
+        return service;
     }
-    if (stored) {
-        service.wanted = (*stored).*place.wanted;
-    }
-    const auto found = std::find_if(
-        down.begin(), down.end(), [&place](const ServiceDown& each) { return each.service == place.daemon; });
+
+private:
+    const ModuleTable& table_;
+    const Principal& principal_;
+    const Row* former_ = nullptr; ///< FTP and FTPS share one
+    Json::Value settings_;
+};
+
+void addState(Service& service, const std::string& daemon, const std::vector<ServiceDown>& down) {
+    const auto found = std::ranges::find(down, daemon, &ServiceDown::service);
     // FTP and FTPS share a daemon; the one that is off is not down.
     if (found != down.end() && service.wanted.value_or(true)) {
         service.running = found->servesFormerSettings;
@@ -74,12 +77,10 @@ Service describe(const Place& place, const Json::Value& settings, const std::opt
     } else {
         service.running = service.enabled.isBool() && service.enabled.asBool();
     }
-    return service;
 }
 
 std::string titleOf(const ServiceDown& down) {
-    const std::string name = down.service == "sftp" ? "SFTP" : "FTP";
-    return "The " + name + " service " +
+    return "The " + down.label + " service " +
            (down.servesFormerSettings ? "runs with its former settings." : "does not run.");
 }
 
@@ -87,20 +88,13 @@ std::string titleOf(const ServiceDown& down) {
 
 std::vector<Service> listServices(const ModuleTable& table, const Principal& principal) {
     const std::vector<ServiceDown> down = servicesDown();
-    const std::optional<StoredSwitches> stored = readStoredSwitches();
     std::vector<Service> services;
-    const Row* former = nullptr;
-    Json::Value settings;
-    for (const Place& place : places) {
-        const Row* const row = table.find(place.api, place.version, "get");
-        if (row == nullptr) {
-            continue;
+    Teller teller(table, principal);
+    for (const StoredService& stored : storedServices()) {
+        if (auto service = teller.tell(stored)) {
+            addState(*service, stored.daemon, down);
+            services.push_back(std::move(*service));
         }
-        if (row != former) {
-            settings = settingsOf(*row, principal);
-            former = row;
-        }
-        services.push_back(describe(place, settings, stored, down));
     }
     return services;
 }

@@ -23,7 +23,7 @@ struct Service {
     std::string reason; ///< why it does not run as the settings say, one sentence; "" when it does
 };
 
-/// The services whose module is loaded. Call it as a read.
+/// The services of the loaded modules, and those without a module. Call it as a read.
 std::vector<Service> listServices(const ModuleTable& table, const Principal& principal);
 
 /// "The FTP service does not run. The FTP daemon does not start: ...", for all of them; "" for none.

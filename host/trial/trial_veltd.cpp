@@ -175,8 +175,9 @@ void stopVeltd(const std::filesystem::path& folder) {
     if (const auto process = runningVeltd()) {
         endVeltd(*process);
     }
-    if (openState(folder) < 0 || stopServices() < 0) {
-        throw TrialError(lastErrorSentence());
+    const auto opened = openState(folder);
+    if (const auto stopped = opened ? stopServices() : opened; !stopped) {
+        throw TrialError(stopped.error().message);
     }
 }
 

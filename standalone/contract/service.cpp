@@ -3,17 +3,14 @@
 #include "base/file.h"
 #include "platform/sftp.h"
 #include "standalone/control/daemon_control.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
-#include "standalone/settings/settings.h"
 
 #include <functional>
-#include <optional>
 #include <string>
-#include <string_view>
 
 namespace velt {
 namespace {
@@ -21,33 +18,44 @@ namespace {
 constexpr int keyAfterStart = 1;
 constexpr int keyAfterStop = 2;
 
+Result<const Daemon*> findDaemon(const char* service) {
+    const std::string name = service == nullptr ? "" : service;
+    const Daemon* daemon = daemonServing(name);
+    if (daemon == nullptr) {
+        return Error(ErrorNumber::notFound, "There is no service \"" + name + "\".");
+    }
+    return daemon;
+}
+
 /// Does `act` with the daemon behind the name, as the effect of that name.
-int affect(Effect effect, const char* service, const std::function<int(Daemon)>& act) {
-    return atBoundary([&] {
-        const auto daemon = daemonOf(service);
-        return daemon ? perform(effect, service, [&] { return act(*daemon); }) : -1;
+int affect(Effect effect, const char* service, const std::function<Result<>(const Daemon&)>& act) {
+    return atBoundary([&]() -> Result<> {
+        const auto daemon = findDaemon(service);
+        return daemon ? perform(effect, service, [&] { return act(**daemon); }) : daemon.error();
     });
 }
 
 int setRunKey(const char* service, int value) {
-    return affect(Effect::runKey, service, [service, value](Daemon) {
+    return affect(Effect::runKey, service, [service, value](const Daemon&) -> Result<> {
         if (value != keyAfterStart && value != keyAfterStop) {
-            return fail(ErrorNumber::invalid,
-                        "The run key " + std::to_string(value) + " is neither 1 nor 2.");
+            return Error(ErrorNumber::invalid,
+                         "The run key " + std::to_string(value) + " is neither 1 nor 2.");
         }
-        return toContract(
-            replaceFile(statePath(paths::runKeys) / service, std::to_string(value) + "\n", 0644));
+        const auto file = statePath(paths::runKeys) / service;
+        return replaceFile(file, std::to_string(value) + "\n", 0644);
     });
 }
 
-bool isEnabled(std::string_view service, Daemon daemon) {
-    if (daemon == Daemon::sftp) {
-        const auto settings = orLastError(loadSftpSettings());
-        return settings && settings->enabled;
+Result<int> isEnabled(const char* service) {
+    const auto daemon = findDaemon(service);
+    if (!daemon) {
+        return daemon.error();
     }
-    const auto settings = orLastError(loadFtpSettings());
-    const int bit = service == "ftpd-ssl" ? VELT_FTP_SERVICE_TLS : VELT_FTP_SERVICE_PLAIN;
-    return settings && (settings->record.service_flags & bit) != 0;
+    const auto settings = (*daemon)->settings();
+    if (!settings) {
+        return settings.error();
+    }
+    return isOn(**daemon, *settings, service) ? 1 : 0;
 }
 
 } // namespace
@@ -58,10 +66,7 @@ extern "C" {
 // An unknown service, and settings that cannot be read, are answered with 0 and not with a negative number,
 // which would read as enabled.
 int VLIBServiceIsEnabled(const char* service) {
-    const int enabled = velt::atBoundary([service] {
-        const auto daemon = velt::daemonOf(service);
-        return daemon && velt::isEnabled(service, *daemon) ? 1 : 0;
-    });
+    const int enabled = velt::atBoundary([service] { return velt::isEnabled(service); });
     return enabled > 0 ? 1 : 0;
 }
 
@@ -88,12 +93,7 @@ int VLIBServiceStop(const char* service, int) {
 }
 
 int VLIBServicePause(const char* service) {
-    return velt::affect(velt::Effect::stop, service, [](velt::Daemon daemon) {
-        if (daemon == velt::Daemon::ftp) {
-            return velt::fail(velt::ErrorNumber::invalid, "The FTP service cannot be paused, only stopped.");
-        }
-        return velt::pauseDaemon(daemon);
-    });
+    return velt::affect(velt::Effect::stop, service, velt::pauseDaemon);
 }
 
 int VLIBServiceResume(const char* service) {
@@ -102,7 +102,7 @@ int VLIBServiceResume(const char* service) {
 
 int VELTSFTPIsAlive(void) {
     const int alive =
-        velt::atBoundary([] { return velt::isServing(velt::daemonState(velt::Daemon::sftp)) ? 1 : 0; });
+        velt::atBoundary([] { return velt::isServing(velt::daemonState(velt::sftpDaemon)) ? 1 : 0; });
     return alive > 0 ? 1 : 0;
 }
 

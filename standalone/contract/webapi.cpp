@@ -1,13 +1,38 @@
 #include "platform/webapi.h"
 
-#include "standalone/control/port_conflict.h"
+#include "standalone/contract/last_port_conflict.h"
 #include "standalone/core/boundary.h"
+
+namespace velt {
+namespace {
+
+thread_local PortConflict lastConflict;
+
+Result<> expectNoConflict(const char* service, int firstPort, int lastPort) {
+    lastConflict = {};
+    auto found = findPortConflict(service == nullptr ? "" : service, firstPort, lastPort);
+    if (!found) {
+        return found.error();
+    }
+    if (!*found) {
+        return {};
+    }
+    lastConflict = std::move(**found);
+    return Error(ErrorNumber::portTaken, lastConflict.sentence);
+}
+
+} // namespace
+
+PortConflict lastPortConflict() {
+    return lastConflict;
+}
+
+} // namespace velt
 
 namespace WebUtils {
 
 int IsPortConflict(const char* service, int firstPort, int lastPort) {
-    const int result = velt::atBoundary(
-        [&] { return velt::findPortConflict(service == nullptr ? "" : service, firstPort, lastPort); });
+    const int result = velt::atBoundary([&] { return velt::expectNoConflict(service, firstPort, lastPort); });
     return result < 0 ? 1 : 0;
 }
 

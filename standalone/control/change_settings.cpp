@@ -6,7 +6,8 @@
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemons/candidate.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/settings/settings_store.h"
 
 namespace velt {
@@ -17,15 +18,11 @@ namespace {
 // that switch a service off, or are changed while it is off, must not fail for the want of these; switching
 // it on tests them all.
 Result<> testIfOn(const FtpSettings& settings) {
-    if (enablesFtp(settings.record) && testFtpCandidate(settings) < 0)
-        return lastErrorAsValue();
-    return {};
+    return enablesFtp(settings.record) ? testFtpCandidate(settings) : Result<>();
 }
 
 Result<> testIfOn(const SftpSettings& settings) {
-    if (settings.enabled && testSftpCandidate(settings) < 0)
-        return lastErrorAsValue();
-    return {};
+    return settings.enabled ? testSftpCandidate(settings) : Result<>();
 }
 
 Result<> check(const FtpSettings& settings) {

@@ -15,7 +15,7 @@
 #include <cstring>
 #include <optional>
 #include <string_view>
-#include <utility>
+#include <vector>
 
 namespace velt {
 namespace {
@@ -33,8 +33,8 @@ std::string joinPorts(const std::vector<int>& ports) {
 }
 
 /// Starts the program with `report` as its descriptor 3 and waits for its end, which comes at once: it goes
-/// on in a child of its own. 0, or an errno.
-int spawnDetached(std::vector<std::string> arguments, int report) {
+/// on in a child of its own.
+Result<> spawnDetached(std::vector<std::string>& arguments, int report) {
     std::vector<char*> pointers;
     pointers.reserve(arguments.size() + 1);
     for (std::string& argument : arguments) {
@@ -48,12 +48,13 @@ int spawnDetached(std::vector<std::string> arguments, int report) {
     pid_t pid = 0;
     const int error = ::posix_spawn(&pid, pointers[0], &setup.actions, &setup.attributes, pointers.data(),
                                     environment.data());
-    if (error == 0) {
-        int status = 0;
-        while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
-        }
+    if (error != 0) {
+        return Error("cannot start " + arguments[0] + ": " + std::strerror(error));
     }
-    return error;
+    int status = 0;
+    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
+    }
+    return {};
 }
 
 /// What comes out of the pipe until its end; nothing when that does not come within the limit.
@@ -73,33 +74,30 @@ std::optional<std::string> readReport(int descriptor) {
 
 } // namespace
 
-ChildLauncher::ChildLauncher(std::string daemon) : daemon_(std::move(daemon)) {}
-
-std::string ChildLauncher::launch(const std::filesystem::path& directory, const DaemonPlan& plan) {
+Result<> ChildLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
     std::array<int, 2> ends{-1, -1};
     if (::pipe2(ends.data(), O_CLOEXEC) != 0) {
-        return std::strerror(errno);
+        return Error(std::strerror(errno));
     }
     const UniqueFd readEnd(ends[0]);
     UniqueFd writeEnd(ends[1]);
-    const std::string program = installedFile("velt-supervise").string();
-    std::vector<std::string> arguments{program, directory.string(), daemon_, plan.configurationHash,
-                                       joinPorts(plan.listenPorts)};
-    arguments.insert(arguments.end(), plan.arguments.begin(), plan.arguments.end());
-    if (const int error = spawnDetached(std::move(arguments), writeEnd.get()); error != 0) {
-        return program + " cannot be started: " + std::strerror(error);
+    std::vector<std::string> arguments{installedFile("velt-supervise").string(), folder.string(), daemon_,
+                                       order.configurationHash, joinPorts(order.ports)};
+    arguments.insert(arguments.end(), order.arguments.begin(), order.arguments.end());
+    if (const auto spawned = spawnDetached(arguments, writeEnd.get()); !spawned) {
+        return spawned;
     }
     writeEnd.reset();
     const auto report = readReport(readEnd.get());
     constexpr std::string_view failure = "failed ";
     if (!report) {
-        return "its supervisor does not report in time";
+        return Error("its supervisor does not report in time");
     }
     if (*report == "ready") {
         return {};
     }
-    return report->starts_with(failure) ? report->substr(failure.size())
-                                        : "its supervisor ended without a reason";
+    return Error(report->starts_with(failure) ? report->substr(failure.size())
+                                              : "its supervisor ended without a reason");
 }
 
 } // namespace velt

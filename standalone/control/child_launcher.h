@@ -11,11 +11,11 @@ namespace velt {
 /// A supervisor that is killed stays away: the next start finds what it left and begins anew.
 class ChildLauncher : public SupervisorLauncher {
 public:
-    explicit ChildLauncher(std::string daemon);
+    explicit ChildLauncher(std::string_view daemon) : daemon_(daemon) {}
 
-    std::string launch(const std::filesystem::path& directory, const DaemonPlan& plan) override;
-    std::string keep(const std::filesystem::path&, const DaemonPlan&) override { return {}; }
-    std::string retire() override { return {}; }
+    Result<> launch(const std::filesystem::path& folder, const DaemonOrder& order) override;
+    Result<> keep(const std::filesystem::path&, const DaemonOrder&) override { return {}; }
+    Result<> retire() override { return {}; }
 
 private:
     std::string daemon_;

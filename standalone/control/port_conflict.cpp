@@ -1,11 +1,9 @@
 #include "standalone/control/port_conflict.h"
 
-#include "standalone/control/services.h"
-#include "standalone/core/last_error.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/ports/known_services.h"
 #include "standalone/ports/port_range.h"
 #include "standalone/process/listening_sockets.h"
-#include "standalone/settings/settings.h"
 
 #include <algorithm>
 #include <optional>
@@ -16,31 +14,21 @@
 namespace velt {
 namespace {
 
-constexpr std::string_view ftpService = "ftp";
-constexpr std::string_view sftpService = "ssh";
 constexpr int highestPort = 65535;
-
-/// A port that the service cannot have. What is wrong with the numbers alone has no holder.
-struct Conflict {
-    PortConflict found;
-    std::string sentence;
-};
-
-thread_local PortConflict lastConflict;
-
-/// The ports that belong to a service of ours by the stored settings.
-struct ConfiguredPorts {
-    int ftpControl = 0;
-    VELT_FTP_PORT_RANGE ftpPassive{};
-    int sftp = 0;
-};
 
 struct Question {
     std::string_view service;
     VELT_FTP_PORT_RANGE range;
+    const Daemon* daemon; ///< the service's, when it is one of ours
 
     bool holds(int port) const { return range.first <= port && port <= range.last; }
     bool isOnePort() const { return range.first == range.last; }
+};
+
+/// What the stored settings give to a daemon.
+struct Claim {
+    const Daemon* daemon;
+    DaemonPorts ports;
 };
 
 bool contains(const VELT_FTP_PORT_RANGE& range, int port) {
@@ -53,64 +41,67 @@ int firstCommonPort(const VELT_FTP_PORT_RANGE& one, const VELT_FTP_PORT_RANGE& o
     return first <= std::min(one.last, other.last) ? first : 0;
 }
 
-Conflict heldBy(int port, const std::string& holder) {
-    return {{port, holder}, "Port " + std::to_string(port) + " is taken by " + holder + "."};
+PortConflict heldBy(int port, const std::string& holder) {
+    return {port, holder, "Port " + std::to_string(port) + " is taken by " + holder + "."};
 }
 
-std::optional<ConfiguredPorts> loadConfiguredPorts() {
-    const auto ftp = orLastError(loadFtpSettings());
-    const auto sftp = orLastError(loadSftpSettings());
-    if (!ftp || !sftp) {
-        return std::nullopt;
+Result<std::vector<Claim>> loadClaims() {
+    std::vector<Claim> claims;
+    for (const Daemon* daemon : allDaemons()) {
+        const auto settings = daemon->settings();
+        if (!settings) {
+            return settings.error();
+        }
+        for (const DaemonPorts& ports : settings->ports) {
+            claims.push_back({daemon, ports});
+        }
     }
-    return ConfiguredPorts{controlPort(ftp->record), passiveRange(ftp->record), sftp->port};
+    return claims;
 }
 
-std::optional<Conflict> conflictOfForm(const Question& question) {
+std::optional<PortConflict> conflictOfForm(const Question& question) {
     const VELT_FTP_PORT_RANGE& range = question.range;
     for (const int port : {range.first, range.last}) {
         if (port < 1 || port > highestPort) {
-            return Conflict{{port, ""},
-                            "The port " + std::to_string(port) + " is not one from 1 to " +
-                                std::to_string(highestPort) + "."};
+            return PortConflict{port, "",
+                                "The port " + std::to_string(port) + " is not one from 1 to " +
+                                    std::to_string(highestPort) + "."};
         }
     }
     if (range.first > range.last) {
-        return Conflict{{range.first, ""}, "The range " + formatPortRange(range) + " is upside down."};
+        return PortConflict{range.first, "", "The range " + formatPortRange(range) + " is upside down."};
     }
     return std::nullopt;
 }
 
-std::optional<Conflict> conflictWithConfiguration(const Question& question, const ConfiguredPorts& ports) {
-    if (question.service != sftpService && question.holds(ports.sftp)) {
-        return heldBy(ports.sftp, "the SFTP service");
-    }
-    // A single port may be asked for by the FTP service since it is its control port; a range may not hold
-    // it.
-    if (!(question.service == ftpService && question.isOnePort()) && question.holds(ports.ftpControl)) {
-        return heldBy(ports.ftpControl, "the control connections of the FTP service");
-    }
-    const int passive = firstCommonPort(question.range, ports.ftpPassive);
-    if (question.service != ftpService && passive != 0) {
-        return heldBy(passive,
-                      "the passive range " + formatPortRange(ports.ftpPassive) + " of the FTP service");
+/// Whether the claim is the asking service's own and may overlap with what it asks for. A single port may be
+/// asked for since the daemon listens on it; a range for the sessions may not hold that port.
+bool mayOverlap(const Question& question, const Claim& claim) {
+    return claim.daemon == question.daemon && (claim.ports.ofSessions || question.isOnePort());
+}
+
+std::optional<PortConflict> conflictWithConfiguration(const Question& question,
+                                                      const std::vector<Claim>& claims) {
+    for (const Claim& claim : claims) {
+        const int port = firstCommonPort(question.range, claim.ports.range);
+        if (port != 0 && !mayOverlap(question, claim)) {
+            return heldBy(port, claim.ports.use);
+        }
     }
     return std::nullopt;
 }
 
 /// Whether the asking service has the port already, so that nobody else is asked about it.
-bool isOwnPort(const Question& question, const ConfiguredPorts& ports, int port) {
-    if (question.service == sftpService) {
-        return port == ports.sftp;
-    }
-    if (question.service != ftpService) {
-        return false;
-    }
-    return question.isOnePort() ? port == ports.ftpControl : contains(ports.ftpPassive, port);
+bool isOwnPort(const Question& question, const std::vector<Claim>& claims, int port) {
+    return std::ranges::any_of(claims, [&](const Claim& claim) {
+        return claim.daemon == question.daemon && claim.ports.ofSessions != question.isOnePort() &&
+               contains(claim.ports.range, port);
+    });
 }
 
-std::optional<Conflict> conflictWithKnownService(const Question& question, const ConfiguredPorts& ports,
-                                                 const std::vector<KnownService>& services) {
+std::optional<PortConflict> conflictWithKnownService(const Question& question,
+                                                     const std::vector<Claim>& claims,
+                                                     const std::vector<KnownService>& services) {
     for (const KnownService& service : services) {
         if (service.name == question.service) {
             continue;
@@ -118,7 +109,7 @@ std::optional<Conflict> conflictWithKnownService(const Question& question, const
         const int first = firstCommonPort(question.range, {service.firstPort, service.lastPort});
         const int last = std::min(question.range.last, service.lastPort);
         for (int port = first; port != 0 && port <= last; ++port) {
-            if (!isOwnPort(question, ports, port)) {
+            if (!isOwnPort(question, claims, port)) {
                 return heldBy(port, "the service " + service.name + " of this server");
             }
         }
@@ -126,24 +117,27 @@ std::optional<Conflict> conflictWithKnownService(const Question& question, const
     return std::nullopt;
 }
 
-/// The daemon of the asking service and its sessions, some of which listen on passive ports.
-std::vector<ProcessId> ownProcesses(const Question& question) {
-    if (question.service != ftpService && question.service != sftpService) {
-        return {};
+/// The daemon of the asking service and its sessions, some of which listen on ports of their own.
+std::set<pid_t> ownProcesses(const Question& question) {
+    std::set<pid_t> own;
+    if (question.daemon != nullptr) {
+        const DaemonState state = daemonState(*question.daemon);
+        std::vector<ProcessId> roots = state.sessions;
+        roots.push_back(state.daemon);
+        roots.push_back(state.supervisor);
+        for (const ProcessId& process : livingTrees(roots)) {
+            own.insert(process.pid);
+        }
     }
-    const ServiceState state = serviceState(question.service == ftpService ? "ftpd" : "sftp");
-    std::vector<ProcessId> roots = state.sessions;
-    roots.push_back(state.daemon);
-    roots.push_back(state.supervisor);
-    return livingTrees(roots);
+    return own;
 }
 
-std::optional<Conflict> conflictWithListener(const Question& question, const ConfiguredPorts& ports) {
+std::optional<PortConflict> conflictWithListener(const Question& question, const std::vector<Claim>& claims) {
     std::vector<ListeningSocket> sockets = listeningSockets();
     // A stored passive range may have a port less, since each session takes one that is free. A daemon's own
     // port must be free, also when it is the stored one: the service may have been off.
     const auto canDoWithout = [&](int port) {
-        return !question.isOnePort() && isOwnPort(question, ports, port);
+        return !question.isOnePort() && isOwnPort(question, claims, port);
     };
     std::erase_if(sockets, [&](const ListeningSocket& socket) {
         return !question.holds(socket.port) || canDoWithout(socket.port);
@@ -152,53 +146,41 @@ std::optional<Conflict> conflictWithListener(const Question& question, const Con
         return std::nullopt;
     }
     const auto owners = ownersOf(sockets);
-    std::set<pid_t> own;
-    for (const ProcessId& process : ownProcesses(question)) {
-        own.insert(process.pid);
-    }
+    const auto own = ownProcesses(question);
     for (const ListeningSocket& socket : sockets) {
         const auto owner = owners.find(socket.inode);
         const SocketOwner found = owner == owners.end() ? SocketOwner{} : owner->second;
-        if (own.count(found.pid) == 0) {
+        if (!own.contains(found.pid)) {
             return heldBy(socket.port, describeOwner(found));
         }
     }
     return std::nullopt;
 }
 
-/// 0 when there is none; else negative, with the last error set and the conflict remembered.
-int findConflict(const Question& question) {
-    const auto report = [](const Conflict& conflict) {
-        lastConflict = conflict.found;
-        return fail(ErrorNumber::portTaken, conflict.sentence);
-    };
-    if (const auto conflict = conflictOfForm(question)) {
-        return report(*conflict);
-    }
-    const auto ports = loadConfiguredPorts();
-    const auto services = orLastError(loadKnownServices());
-    if (!ports || !services) {
-        return -1; // a question that cannot be answered is no permission to take the port
-    }
-    if (const auto conflict = conflictWithConfiguration(question, *ports)) {
-        return report(*conflict);
-    }
-    if (const auto conflict = conflictWithKnownService(question, *ports, *services)) {
-        return report(*conflict);
-    }
-    const auto conflict = conflictWithListener(question, *ports);
-    return conflict ? report(*conflict) : 0;
-}
-
 } // namespace
 
-PortConflict lastPortConflict() {
-    return lastConflict;
-}
-
-int findPortConflict(std::string_view service, int firstPort, int lastPort) {
-    lastConflict = {};
-    return findConflict({service, {firstPort, lastPort}});
+Result<std::optional<PortConflict>> findPortConflict(std::string_view service, int firstPort, int lastPort) {
+    const auto rows = allDaemons();
+    const auto row = std::ranges::find(rows, service, &Daemon::portName);
+    const Question question{service, {firstPort, lastPort}, row == rows.end() ? nullptr : *row};
+    if (auto conflict = conflictOfForm(question)) {
+        return conflict;
+    }
+    const auto claims = loadClaims();
+    if (!claims) {
+        return claims.error();
+    }
+    const auto services = loadKnownServices();
+    if (!services) {
+        return services.error();
+    }
+    if (auto conflict = conflictWithConfiguration(question, *claims)) {
+        return conflict;
+    }
+    if (auto conflict = conflictWithKnownService(question, *claims, *services)) {
+        return conflict;
+    }
+    return conflictWithListener(question, *claims);
 }
 
 } // namespace velt

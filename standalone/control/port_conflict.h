@@ -2,24 +2,24 @@
 #ifndef VELT_STANDALONE_CONTROL_PORT_CONFLICT_H
 #define VELT_STANDALONE_CONTROL_PORT_CONFLICT_H
 
+#include "base/result.h"
+
+#include <optional>
 #include <string>
 #include <string_view>
 
 namespace velt {
 
-/// Who holds a port.
+/// A port that a service cannot have.
 struct PortConflict {
-    int port = 0;       ///< 0: there was no conflict
-    std::string holder; ///< in words: "the SFTP service", "nginx (process 812)"
+    int port = 0;
+    std::string holder; ///< in words: "the SFTP service", "nginx (process 812)"; "" when the number is wrong
+    std::string sentence; ///< for people
 };
 
-/// Whether the service ("ftp", "ssh", or another's name) cannot have one of these ports: 0 when it can have
-/// them all; else negative, with the last error set and the conflict kept for lastPortConflict. A question
-/// that cannot be answered is no permission to take the port. Thread-safe.
-int findPortConflict(std::string_view service, int firstPort, int lastPort);
-
-/// What the calling thread's last findPortConflict found.
-PortConflict lastPortConflict();
+/// The first of these ports that the service ("ftp", "ssh", or another's name) cannot have; nothing when it
+/// can have them all. Fails when that cannot be told, which is no permission to take them. Thread-safe.
+Result<std::optional<PortConflict>> findPortConflict(std::string_view service, int firstPort, int lastPort);
 
 } // namespace velt
 

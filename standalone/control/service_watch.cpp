@@ -1,18 +1,22 @@
 #include "standalone/control/service_watch.h"
 
 #include "standalone/control/daemon_control.h"
-#include "standalone/control/service_backend.h"
-#include "standalone/core/boundary.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
+#include "standalone/core/error_number.h"
 
 #include <syslog.h>
 
 #include <algorithm>
-#include <array>
 #include <condition_variable>
+#include <exception>
 #include <memory>
 #include <mutex>
+#include <optional>
+#include <string>
+#include <system_error>
 #include <thread>
+#include <vector>
 
 namespace velt {
 namespace {
@@ -27,14 +31,14 @@ constexpr milliseconds longestBackOff{30000};
 /// One daemon under watch. A start that fails is tried again, at growing intervals.
 class WatchedDaemon {
 public:
-    explicit WatchedDaemon(Daemon daemon) : daemon_(daemon) {}
+    explicit WatchedDaemon(const Daemon& daemon) : daemon_(daemon) {}
 
     void look() {
-        const ServiceState state = daemonState(daemon_);
+        const DaemonState state = daemonState(daemon_);
         const bool lost = lostItsSupervisor(state);
         if (lost && !retryAt_) {
-            ::syslog(LOG_ERR, "the supervisor of %s, process %d, has ended: the daemon is started again",
-                     daemonName(daemon_).c_str(), static_cast<int>(state.supervisor.pid));
+            ::syslog(LOG_ERR, "%s lost its supervisor, process %d, and is started again",
+                     titleOf(daemon_).c_str(), static_cast<int>(state.supervisor.pid));
         }
         const bool missing = lost || (retryAt_ && !isServing(state));
         if (!missing) {
@@ -47,18 +51,17 @@ public:
 
 private:
     void restore() {
-        const int result =
-            perform(Effect::start, daemonName(daemon_), [this] { return restoreDaemon(daemon_); });
-        if (result >= 0) {
+        const auto restored = perform(Effect::start, daemon_.name, [this] { return restoreDaemon(daemon_); });
+        if (restored) {
             retryAt_.reset();
             return;
         }
-        ::syslog(LOG_ERR, "%s", lastErrorSentence().c_str());
+        ::syslog(LOG_ERR, "%s", restored.error().message.c_str());
         retryAt_ = Clock::now() + backOff_;
         backOff_ = std::min(backOff_ * 2, longestBackOff);
     }
 
-    Daemon daemon_;
+    const Daemon& daemon_;
     std::optional<Clock::time_point> retryAt_;
     milliseconds backOff_ = shortestBackOff;
 };
@@ -79,15 +82,17 @@ public:
 
 private:
     void run() {
-        std::array daemons{WatchedDaemon(Daemon::ftp), WatchedDaemon(Daemon::sftp)};
+        std::vector<WatchedDaemon> daemons;
+        for (const Daemon* daemon : allDaemons()) {
+            daemons.emplace_back(*daemon);
+        }
         std::unique_lock lock(mutex_);
         while (!wake_.wait_for(lock, interval, [this] { return ended_; })) {
             lock.unlock();
-            for (WatchedDaemon& daemon : daemons) {
-                atBoundary([&daemon] {
-                    daemon.look();
-                    return 0;
-                });
+            try {
+                std::ranges::for_each(daemons, &WatchedDaemon::look);
+            } catch (const std::exception& error) {
+                ::syslog(LOG_ERR, "cannot look after the daemons: %s", error.what());
             }
             lock.lock();
         }
@@ -111,14 +116,17 @@ TheWatch& theWatch() {
 
 } // namespace
 
-int watchServices() {
-    return atBoundary([] {
-        const std::lock_guard lock(theWatch().mutex);
-        if (theWatch().watch == nullptr && !systemdKeepsSupervisors()) {
-            theWatch().watch = std::make_unique<ServiceWatch>();
-        }
-        return 0;
-    });
+Result<> watchServices() {
+    const std::lock_guard lock(theWatch().mutex);
+    if (theWatch().watch != nullptr || systemdKeepsSupervisors()) {
+        return {};
+    }
+    try {
+        theWatch().watch = std::make_unique<ServiceWatch>();
+    } catch (const std::system_error& error) {
+        return Error(ErrorNumber::daemon, std::string("Cannot start a thread: ") + error.what() + ".");
+    }
+    return {};
 }
 
 void unwatchServices() {

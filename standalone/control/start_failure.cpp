@@ -1,7 +1,6 @@
 #include "standalone/control/start_failure.h"
-
 #include "base/file.h"
-#include "standalone/core/last_error.h"
+
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
@@ -11,24 +10,23 @@
 namespace velt {
 namespace {
 
-std::filesystem::path noteFile(const std::string& daemon) {
-    return statePath(paths::run) / (daemon + ".failure");
+std::filesystem::path noteFile(const Daemon& daemon) {
+    return statePath(paths::run) / (std::string(daemon.name) + ".failure");
 }
 
 } // namespace
 
-int noteOutcome(const std::string& daemon, int result) {
-    if (result >= 0) {
+Result<> noteOutcome(const Daemon& daemon, Result<> outcome) {
+    if (outcome) {
         std::error_code ignored;
         std::filesystem::remove(noteFile(daemon), ignored);
-        return result;
+    } else {
+        (void)replaceFile(noteFile(daemon), outcome.error().message, 0644);
     }
-    const LastErrorKept kept;
-    static_cast<void>(replaceFile(noteFile(daemon), lastErrorSentence(), 0644));
-    return result;
+    return outcome;
 }
 
-std::optional<std::string> startFailure(const std::string& daemon) {
+std::optional<std::string> startFailure(const Daemon& daemon) {
     const auto note = readFile(noteFile(daemon));
     return note ? std::optional(*note) : std::nullopt;
 }

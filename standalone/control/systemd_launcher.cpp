@@ -1,11 +1,11 @@
 #include "standalone/control/systemd_launcher.h"
-
 #include "base/file.h"
+
 #include "standalone/control/systemd_unit.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 #include "standalone/supervise/control_channel.h"
-#include "standalone/supervise/service_state.h"
+#include "standalone/supervise/daemon_state.h"
 
 #include <chrono>
 #include <utility>
@@ -24,53 +24,52 @@ std::string withoutLineEnd(std::string text) {
 }
 
 /// systemctl's own reason, where it has one.
-std::string reasonOf(const ProcessResult& failed) {
+Error reasonOf(const ProcessResult& failed) {
     const std::string words = lastWords(failed.errors);
-    return words.empty() ? "systemctl ended with status " + std::to_string(failed.exitCode) : words;
+    return Error(words.empty() ? "systemctl ended with status " + std::to_string(failed.exitCode) : words);
 }
 
 } // namespace
 
-SystemdLauncher::SystemdLauncher(std::string daemon, SystemdPlaces places)
-    : daemon_(std::move(daemon)), places_(std::move(places)) {}
+SystemdLauncher::SystemdLauncher(const Daemon& daemon, SystemdPlaces places)
+    : daemon_(daemon), unit_(unitName(daemon)), places_(std::move(places)) {}
 
-std::string SystemdLauncher::launch(const std::filesystem::path& directory, const DaemonPlan& plan) {
-    if (std::string reason = keep(directory, plan); !reason.empty()) {
-        return reason;
+Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
+    if (const auto kept = keep(folder, order); !kept) {
+        return kept;
     }
-    if (std::string reason = writeUnits(directory); !reason.empty()) {
-        return reason;
+    if (const auto written = writeUnits(folder); !written) {
+        return written;
     }
     // Not "start": after a killed supervisor systemd may be waiting to start it again, and a daemon of the
     // former settings with it.
-    const ProcessResult started =
-        runProcess({places_.systemctl, "restart", unitName(daemon_)}, {}, startLimit);
+    const ProcessResult started = runProcess({places_.systemctl, "restart", unit_}, {}, startLimit);
     if (started.exitCode == 0) {
-        const auto now = readServiceState(stateFile(directory, daemon_));
-        return now && isServing(*now) ? std::string()
-                                      : "systemd says that it has started it, but it does not serve";
+        const auto now = readDaemonState(stateFile(folder, std::string(daemon_.name)));
+        return now && isServing(*now) ? Result<>()
+                                      : Error("systemd says that it has started it, but it does not serve");
     }
-    std::string reason = started.exitCode < 0 ? "its supervisor does not report in time" : reasonOfFailure();
-    runProcess({places_.systemctl, "stop", "--no-block", unitName(daemon_)});
-    return reason.empty() ? reasonOf(started) : reason;
+    const std::string reason =
+        started.exitCode < 0 ? "its supervisor does not report in time" : reasonOfFailure();
+    runProcess({places_.systemctl, "stop", "--no-block", unit_});
+    return reason.empty() ? reasonOf(started) : Error(reason);
 }
 
-std::string SystemdLauncher::keep(const std::filesystem::path& directory, const DaemonPlan& plan) {
-    const ControlRequest order{Command::start, {plan.configurationHash, plan.listenPorts, plan.arguments}};
-    const auto written = replaceFile(orderFile(directory, daemon_), encodeRequest(order), 0600);
-    return written ? std::string() : written.error().message;
+Result<> SystemdLauncher::keep(const std::filesystem::path& folder, const DaemonOrder& order) {
+    const auto file = orderFile(folder, std::string(daemon_.name));
+    return replaceFile(file, encodeRequest({Command::start, order}), 0600);
 }
 
 /// systemd reads all its units again for new ones, which it need not do for those that are as they were.
-std::string SystemdLauncher::writeUnits(const std::filesystem::path& directory) const {
+Result<> SystemdLauncher::writeUnits(const std::filesystem::path& folder) const {
     bool written = false;
-    for (const UnitFile& unit : unitFiles(daemon_, directory)) {
+    for (const UnitFile& unit : unitFiles(daemon_, folder)) {
         const std::filesystem::path file = places_.units / unit.name;
         if (readFile(file) == unit.text) {
             continue;
         }
-        if (const auto replaced = replaceFile(file, unit.text, 0644); !replaced) {
-            return replaced.error().message;
+        if (auto replaced = replaceFile(file, unit.text, 0644); !replaced) {
+            return replaced;
         }
         written = true;
     }
@@ -78,25 +77,24 @@ std::string SystemdLauncher::writeUnits(const std::filesystem::path& directory) 
         return {};
     }
     const ProcessResult reloaded = runProcess({places_.systemctl, "daemon-reload"});
-    return reloaded.exitCode == 0 ? std::string() : reasonOf(reloaded);
+    return reloaded.exitCode == 0 ? Result<>() : reasonOf(reloaded);
 }
 
 /// What the supervisor said last.
 std::string SystemdLauncher::reasonOfFailure() const {
     return withoutLineEnd(
-        runProcess({places_.systemctl, "show", "--value", "--property=StatusText", unitName(daemon_)})
-            .output);
+        runProcess({places_.systemctl, "show", "--value", "--property=StatusText", unit_}).output);
 }
 
-std::string SystemdLauncher::retire() {
+Result<> SystemdLauncher::retire() {
     std::error_code error;
-    if (!std::filesystem::exists(places_.units / unitName(daemon_), error)) {
+    if (!std::filesystem::exists(places_.units / unit_, error)) {
         return {};
     }
-    const ProcessResult stopped = runProcess({places_.systemctl, "stop", unitName(daemon_)});
-    // A daemon that did not start is a failure of the machine's until somebody switches it off.
-    runProcess({places_.systemctl, "reset-failed", unitName(daemon_)});
-    return stopped.exitCode == 0 ? std::string() : reasonOf(stopped);
+    const ProcessResult stopped = runProcess({places_.systemctl, "stop", unit_});
+    // Until somebody switches it off, a daemon that did not start is a failure of the machine.
+    runProcess({places_.systemctl, "reset-failed", unit_});
+    return stopped.exitCode == 0 ? Result<>() : reasonOf(stopped);
 }
 
 } // namespace velt

@@ -3,6 +3,7 @@
 #define VELT_STANDALONE_CONTROL_SYSTEMD_LAUNCHER_H
 
 #include "standalone/control/supervisor_launcher.h"
+#include "standalone/daemons/daemon.h"
 
 #include <filesystem>
 #include <string>
@@ -16,20 +17,21 @@ struct SystemdPlaces {
     std::filesystem::path units = "/run/systemd/system";
 };
 
-/// A supervisor that is killed is started again by systemd, with the plan that was launched or kept last.
+/// A supervisor that is killed is started again by systemd, with the order that was launched or kept last.
 class SystemdLauncher : public SupervisorLauncher {
 public:
-    explicit SystemdLauncher(std::string daemon, SystemdPlaces places = {});
+    explicit SystemdLauncher(const Daemon& daemon, SystemdPlaces places = {});
 
-    std::string launch(const std::filesystem::path& directory, const DaemonPlan& plan) override;
-    std::string keep(const std::filesystem::path& directory, const DaemonPlan& plan) override;
-    std::string retire() override;
+    Result<> launch(const std::filesystem::path& folder, const DaemonOrder& order) override;
+    Result<> keep(const std::filesystem::path& folder, const DaemonOrder& order) override;
+    Result<> retire() override;
 
 private:
-    std::string writeUnits(const std::filesystem::path& directory) const;
+    Result<> writeUnits(const std::filesystem::path& folder) const;
     std::string reasonOfFailure() const;
 
-    std::string daemon_;
+    const Daemon& daemon_;
+    std::string unit_;
     SystemdPlaces places_;
 };
 

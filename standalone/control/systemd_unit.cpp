@@ -8,8 +8,8 @@
 
 namespace velt {
 
-std::string unitName(const std::string& daemon) {
-    return "velt-" + daemon + ".service";
+std::string unitName(const Daemon& daemon) {
+    return "velt-" + std::string(daemon.name) + ".service";
 }
 
 std::string quoteUnitWord(std::string_view argument) {
@@ -34,17 +34,17 @@ std::string quoteUnitWord(std::string_view argument) {
 
 // Not the daemon itself: SFTP sessions register with the login manager, which moves them out of the unit's
 // control group, so once their listener is gone only their ancestry shows whose they are.
-std::string renderUnit(const std::string& daemon, const std::filesystem::path& directory) {
+std::string renderUnit(const Daemon& daemon, const std::filesystem::path& folder) {
     std::ostringstream text;
     text << "[Unit]\n"
-         << "Description=VELT " << (daemon == "sftp" ? "SFTP" : "FTP") << " server\n"
+         << "Description=VELT " << daemon.label << " server\n"
          << "After=network.target\n"
-         // An administrator who changes settings often is no loop of crashes.
+         // An administrator who changes settings often must not be taken for a loop of crashes.
          << "StartLimitIntervalSec=0\n"
          << "\n[Service]\n"
          << "Type=notify\n"
          << "ExecStart=" << quoteUnitWord(installedFile("velt-supervise").string()) << ' '
-         << quoteUnitWord(directory.string()) << ' ' << quoteUnitWord(daemon)
+         << quoteUnitWord(folder.string()) << ' ' << quoteUnitWord(daemon.name)
          << '\n'
          // A supervisor that was killed comes back, one that says that its daemon does not start is not asked
          // again. It starts the daemon anew itself.
@@ -59,11 +59,10 @@ std::string renderUnit(const std::string& daemon, const std::filesystem::path& d
     return text.str();
 }
 
-std::vector<UnitFile> unitFiles(const std::string& daemon, const std::filesystem::path& directory) {
-    std::vector<UnitFile> files{{unitName(daemon), renderUnit(daemon, directory)}};
-    if (daemon == "sftp") {
-        // /run/sshd is that unit's, and gone when it is stopped; but each of our connections needs it, too.
-        files.push_back({"ssh.service.d/velt-sftp.conf", "[Service]\nRuntimeDirectoryPreserve=yes\n"});
+std::vector<UnitFile> unitFiles(const Daemon& daemon, const std::filesystem::path& folder) {
+    std::vector<UnitFile> files{{unitName(daemon), renderUnit(daemon, folder)}};
+    for (const UnitDropIn& dropIn : daemon.dropIns) {
+        files.push_back({dropIn.file, std::string(dropIn.text)});
     }
     return files;
 }

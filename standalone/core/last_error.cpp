@@ -62,14 +62,4 @@ void clearLastError() {
     lastError() = LastError();
 }
 
-struct LastErrorKept::Kept {
-    LastError error;
-};
-
-LastErrorKept::LastErrorKept() : kept_(std::make_unique<Kept>(Kept{lastError()})) {}
-
-LastErrorKept::~LastErrorKept() {
-    lastError() = std::move(kept_->error);
-}
-
 } // namespace velt

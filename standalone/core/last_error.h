@@ -4,7 +4,6 @@
 
 #include "standalone/core/error_number.h"
 
-#include <memory>
 #include <optional>
 #include <string>
 
@@ -41,20 +40,6 @@ const std::string& lastErrorSentence();
 
 /// Forgets the calling thread's last error.
 void clearLastError();
-
-/// Puts the calling thread's last error back as it was at the construction, when it goes: for work whose
-/// failures are not those of the operation that it belongs to. Stays on its thread.
-class LastErrorKept {
-public:
-    LastErrorKept();
-    ~LastErrorKept();
-    LastErrorKept(const LastErrorKept&) = delete;
-    LastErrorKept& operator=(const LastErrorKept&) = delete;
-
-private:
-    struct Kept;
-    std::unique_ptr<Kept> kept_;
-};
 
 } // namespace velt
 

@@ -12,7 +12,6 @@
 #include "standalone/firewall/ruleset.h"
 #include "standalone/firewall/ruleset_generation.h"
 #include "standalone/process/run_program.h"
-#include "standalone/settings/settings.h"
 
 #include <syslog.h>
 
@@ -100,7 +99,7 @@ Result<> replaceRules(const std::string& script) {
 
 } // namespace
 
-Result<> loadFirewallRules() {
+Result<> loadFirewallRules(const std::function<Result<std::vector<VELT_FTP_PORT_RANGE>>()>& openPorts) {
     if (!mayTouchRules()) {
         return {};
     }
@@ -118,12 +117,11 @@ Result<> loadFirewallRules() {
     if (off && !rulesWereLoaded()) {
         return {}; // nothing to take away, and perhaps no right to do it
     }
-    const auto ftp = loadFtpSettings();
-    const auto sftp = loadSftpSettings();
-    if (!ftp || !sftp) {
-        return ftp ? sftp.error() : ftp.error();
+    const auto ports = openPorts();
+    if (!ports) {
+        return ports.error();
     }
-    const std::string script = renderRuleset(*firewall, servicePorts(*ftp, *sftp));
+    const std::string script = renderRuleset(*firewall, *ports);
     return off ? removeRules(script) : replaceRules(script);
 }
 

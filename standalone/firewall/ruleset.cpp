@@ -24,19 +24,6 @@ std::string renderOpenPorts(const std::vector<VELT_FTP_PORT_RANGE>& ranges) {
 
 } // namespace
 
-std::vector<VELT_FTP_PORT_RANGE> servicePorts(const FtpSettings& ftp, const SftpSettings& sftp) {
-    std::vector<VELT_FTP_PORT_RANGE> ports;
-    if ((ftp.record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0) {
-        const int control = controlPort(ftp.record);
-        ports.push_back({control, control});
-        ports.push_back(passiveRange(ftp.record));
-    }
-    if (sftp.enabled) {
-        ports.push_back({sftp.port, sftp.port});
-    }
-    return ports;
-}
-
 std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& ports) {
     // To add a table that is there already is no error, to delete one that is not would be.
     std::string text = "add table inet velt_fileserv\n"

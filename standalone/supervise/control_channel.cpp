@@ -9,17 +9,20 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <charconv>
 #include <cstring>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 namespace velt {
 namespace {
 
 constexpr std::size_t largestMessage = 64UL * 1024;
+constexpr std::string_view failure = "failed "; ///< begins an answer that is not "ok"
 constexpr std::array<std::pair<Command, std::string_view>, 3> commandNames{{
     {Command::start, "start"},
     {Command::pause, "pause"},
@@ -30,26 +33,19 @@ constexpr std::array<std::pair<Command, std::string_view>, 3> commandNames{{
 /// that an address has room for.
 class SocketAddress {
 public:
-    SocketAddress(const std::filesystem::path& directory, const std::string& service)
-        : folder_(::open(directory.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {
-        const std::string path = "/proc/self/fd/" + std::to_string(folder_) + "/" + service + ".sock";
+    SocketAddress(const std::filesystem::path& folder, const std::string& daemon)
+        : folder_(::open(folder.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {
+        const std::string path = "/proc/self/fd/" + std::to_string(folder_.get()) + "/" + daemon + ".sock";
         address_.sun_family = AF_UNIX;
         path.copy(address_.sun_path, sizeof address_.sun_path - 1);
     }
-    ~SocketAddress() {
-        if (folder_ >= 0) {
-            ::close(folder_);
-        }
-    }
-    SocketAddress(const SocketAddress&) = delete;
-    SocketAddress& operator=(const SocketAddress&) = delete;
 
     const sockaddr* get() const { return reinterpret_cast<const sockaddr*>(&address_); }
     const char* path() const { return address_.sun_path; }
     static socklen_t size() { return sizeof(sockaddr_un); }
 
 private:
-    int folder_;
+    UniqueFd folder_;
     sockaddr_un address_{};
 };
 
@@ -127,18 +123,17 @@ std::string encodeRequest(const ControlRequest& request) {
     return message;
 }
 
-std::optional<ControlRequest> decodeRequest(const std::string& message) {
+Result<ControlRequest> decodeRequest(const std::string& message) {
+    const Error malformed("the request was not understood");
     const std::vector<std::string> fields = splitFields(message);
-    ControlRequest request;
-    bool known = false;
-    for (const auto& [command, name] : commandNames) {
-        if (!fields.empty() && fields[0] == name) {
-            request.command = command;
-            known = true;
-        }
+    const auto* const known = std::ranges::find_if(
+        commandNames, [&](const auto& each) { return !fields.empty() && fields[0] == each.second; });
+    if (known == commandNames.end()) {
+        return malformed;
     }
-    if (!known || request.command != Command::start) {
-        return known ? std::optional(request) : std::nullopt;
+    ControlRequest request{known->first, {}};
+    if (request.command != Command::start) {
+        return request;
     }
     const auto number = [&fields](std::size_t index) {
         int value = -1;
@@ -150,7 +145,7 @@ std::optional<ControlRequest> decodeRequest(const std::string& message) {
     constexpr std::size_t firstPort = 3;
     const int portCount = number(2);
     if (portCount < 0 || fields.size() <= firstPort + static_cast<std::size_t>(portCount)) {
-        return std::nullopt;
+        return malformed;
     }
     const std::size_t firstArgument = firstPort + static_cast<std::size_t>(portCount);
     request.order.configurationHash = fields[1];
@@ -161,67 +156,60 @@ std::optional<ControlRequest> decodeRequest(const std::string& message) {
     return request;
 }
 
-ControlListener::ControlListener(std::filesystem::path directory, std::string service)
-    : directory_(std::move(directory)), service_(std::move(service)) {
-    const SocketAddress address(directory_, service_);
+ControlListener::ControlListener(const std::filesystem::path& folder, const std::string& daemon)
+    : folder_(folder), daemon_(daemon), socket_(::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0)) {}
+
+Result<ControlListener> ControlListener::open(const std::filesystem::path& folder,
+                                              const std::string& daemon) {
+    const SocketAddress address(folder, daemon);
     ::unlink(address.path());
-    descriptor_ = ::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0);
-    // The umask of a supervisor lets nobody but its own user through; who speaks is checked all the same.
-    if (descriptor_ < 0 || ::bind(descriptor_, address.get(), SocketAddress::size()) != 0 ||
-        ::chmod(address.path(), S_IRUSR | S_IWUSR) != 0 || ::listen(descriptor_, 8) != 0) {
-        ::close(descriptor_);
-        descriptor_ = -1;
+    ControlListener listener(folder, daemon);
+    // The umask of a supervisor lets only its own user through; who speaks is checked all the same.
+    if (::bind(listener.descriptor(), address.get(), SocketAddress::size()) != 0 ||
+        ::chmod(address.path(), S_IRUSR | S_IWUSR) != 0 || ::listen(listener.descriptor(), 8) != 0) {
+        return Error("cannot make the control socket in " + folder.string() + ": " + std::strerror(errno));
     }
+    return listener;
 }
 
 ControlListener::~ControlListener() {
-    if (descriptor_ >= 0) {
-        ::close(descriptor_);
-        ::unlink(SocketAddress(directory_, service_).path());
+    if (socket_) {
+        ::unlink(SocketAddress(folder_, daemon_).path());
     }
 }
 
-void ControlListener::serve(const std::function<std::string(const ControlRequest&)>& handle) {
-    const int peer = ::accept4(descriptor_, nullptr, nullptr, SOCK_CLOEXEC);
-    if (peer < 0) {
+void ControlListener::serve(const std::function<Result<>(const ControlRequest&)>& handle) {
+    const UniqueFd peer(::accept4(descriptor(), nullptr, nullptr, SOCK_CLOEXEC));
+    if (!peer || !maySpeak(peer.get())) {
         return;
     }
-    constexpr std::chrono::seconds limit(1); // one who connects and says nothing holds nobody up for long
-    limitSending(peer, limit);
-    if (maySpeak(peer)) {
-        std::string answer = "the request was not understood";
-        if (const auto message = receiveMessage(peer, Clock::now() + limit)) {
-            const auto request = decodeRequest(*message);
-            answer = request ? handle(*request) : answer;
-        }
-        answer.insert(0, answer.empty() ? "ok" : "failed ");
-        ::send(peer, answer.data(), answer.size(), MSG_NOSIGNAL);
-    }
-    ::close(peer);
+    constexpr std::chrono::seconds limit(
+        1); // a peer that connects and says nothing delays the others no longer
+    limitSending(peer.get(), limit);
+    const auto message = receiveMessage(peer.get(), Clock::now() + limit);
+    const auto request = decodeRequest(message.value_or(""));
+    const Result<> done = request ? handle(*request) : request.error();
+    const std::string answer = done ? "ok" : std::string(failure) + done.error().message;
+    ::send(peer.get(), answer.data(), answer.size(), MSG_NOSIGNAL);
 }
 
-std::optional<std::string> askSupervisor(const std::filesystem::path& directory, const std::string& service,
-                                         const ControlRequest& request, std::chrono::milliseconds limit) {
-    const SocketAddress address(directory, service);
-    const int descriptor = ::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0);
-    if (descriptor < 0) {
+std::optional<Result<>> askSupervisor(const std::filesystem::path& folder, const std::string& daemon,
+                                      const ControlRequest& request, std::chrono::milliseconds limit) {
+    const SocketAddress address(folder, daemon);
+    const UniqueFd socket(::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0));
+    const Clock::time_point deadline = Clock::now() + limit;
+    limitSending(socket.get(), limit);
+    const std::string message = encodeRequest(request);
+    const auto connect = [&] { return ::connect(socket.get(), address.get(), SocketAddress::size()); };
+    const auto send = [&] { return ::send(socket.get(), message.data(), message.size(), MSG_NOSIGNAL); };
+    if (!succeeds(connect, deadline) || !succeeds(send, deadline)) {
         return std::nullopt;
     }
-    const Clock::time_point deadline = Clock::now() + limit;
-    limitSending(descriptor, limit);
-    const std::string message = encodeRequest(request);
-    std::optional<std::string> answer;
-    const auto connect = [&] { return ::connect(descriptor, address.get(), SocketAddress::size()); };
-    const auto send = [&] { return ::send(descriptor, message.data(), message.size(), MSG_NOSIGNAL); };
-    if (succeeds(connect, deadline) && succeeds(send, deadline)) {
-        answer = receiveMessage(descriptor, deadline);
-    }
-    ::close(descriptor);
+    const auto answer = receiveMessage(socket.get(), deadline);
     if (!answer) {
         return std::nullopt;
     }
-    constexpr std::string_view failure = "failed ";
-    return answer->starts_with(failure) ? answer->substr(failure.size()) : std::string();
+    return answer->starts_with(failure) ? Error(answer->substr(failure.size())) : Result<>();
 }
 
 } // namespace velt

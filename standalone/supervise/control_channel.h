@@ -2,7 +2,9 @@
 #ifndef VELT_STANDALONE_SUPERVISE_CONTROL_CHANNEL_H
 #define VELT_STANDALONE_SUPERVISE_CONTROL_CHANNEL_H
 
-#include "standalone/supervise/daemon_process.h"
+#include "base/result.h"
+#include "base/unique_fd.h"
+#include "standalone/supervise/daemon_order.h"
 
 #include <chrono>
 #include <filesystem>
@@ -13,7 +15,7 @@
 namespace velt {
 
 enum class Command {
-    start, ///< make this order run; an answer comes when it does or cannot
+    start, ///< make this order run; the answer comes when it does or cannot
     pause, ///< end the listener only
     stop,  ///< end the listener and its sessions; the supervisor ends as well
 };
@@ -23,34 +25,37 @@ struct ControlRequest {
     DaemonOrder order; ///< for a start
 };
 
-/// A request as one message, and back; nothing when the message is not of this form.
+/// A request as one message, and back. Fails when the message does not have this form.
 std::string encodeRequest(const ControlRequest& request);
-std::optional<ControlRequest> decodeRequest(const std::string& message);
+Result<ControlRequest> decodeRequest(const std::string& message);
 
-/// The supervisor's end. Root and the supervisor's own user may speak to it.
+/// The supervisor's end of the channel of a daemon; its socket is removed with it. Only root and the
+/// supervisor's own user may speak to it.
 class ControlListener {
 public:
-    ControlListener(std::filesystem::path directory, std::string service);
+    static Result<ControlListener> open(const std::filesystem::path& folder, const std::string& daemon);
+    ControlListener(ControlListener&&) = default;
     ~ControlListener();
-    ControlListener(const ControlListener&) = delete;
-    ControlListener& operator=(const ControlListener&) = delete;
 
-    /// Readable when a request waits; -1 when the socket could not be made.
-    int descriptor() const { return descriptor_; }
+    /// Readable when a request waits.
+    int descriptor() const { return socket_.get(); }
 
-    /// Takes one request, has it answered by `handle` ("" stands for success) and sends the answer.
-    void serve(const std::function<std::string(const ControlRequest&)>& handle);
+    /// Takes one request and answers with what `handle` returns for it.
+    void serve(const std::function<Result<>(const ControlRequest&)>& handle);
 
 private:
-    std::filesystem::path directory_;
-    std::string service_;
-    int descriptor_ = -1;
+    ControlListener(const std::filesystem::path& folder, const std::string& daemon);
+
+    std::filesystem::path folder_;
+    std::string daemon_;
+    UniqueFd socket_;
 };
 
-/// Sends the request to the service's supervisor and waits for its answer: "" on success, else the reason.
-/// Nothing when no supervisor answers in time.
-std::optional<std::string> askSupervisor(const std::filesystem::path& directory, const std::string& service,
-                                         const ControlRequest& request, std::chrono::milliseconds limit);
+/// Sends the request to the daemon's supervisor, and returns its answer; nothing when no supervisor answers
+/// in time. The error's message is a phrase, as everywhere in this folder: it continues "The FTP daemon does
+/// not start: ".
+std::optional<Result<>> askSupervisor(const std::filesystem::path& folder, const std::string& daemon,
+                                      const ControlRequest& request, std::chrono::milliseconds limit);
 
 } // namespace velt
 

@@ -17,6 +17,7 @@
 #include <cstring>
 #include <string_view>
 #include <utility>
+#include <vector>
 
 namespace velt {
 namespace {
@@ -38,31 +39,24 @@ std::string listPorts(const std::vector<int>& ports) {
 DaemonProcess::DaemonProcess() {
     std::array<int, 2> ends{-1, -1};
     if (::pipe2(ends.data(), O_CLOEXEC) == 0) {
-        readEnd_ = ends[0];
-        writeEnd_ = ends[1];
+        readEnd_ = UniqueFd(ends[0]);
+        writeEnd_ = UniqueFd(ends[1]);
         // Only the reading side: a daemon does not expect its standard error to refuse a line.
-        ::fcntl(readEnd_, F_SETFL, O_NONBLOCK);
+        ::fcntl(readEnd_.get(), F_SETFL, O_NONBLOCK);
     }
 }
 
-DaemonProcess::~DaemonProcess() {
-    if (readEnd_ >= 0) {
-        ::close(readEnd_);
-        ::close(writeEnd_);
-    }
-}
-
-std::string DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadline) {
+Result<> DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadline) {
     readOutput(); // what a former daemon left says nothing about this one
     lastLines_.clear();
     partialLine_.clear();
-    std::string reason = spawn(order);
-    return reason.empty() ? waitUntilListening(order, deadline) : reason;
+    const Result<> spawned = spawn(order);
+    return spawned ? waitUntilListening(order, deadline) : spawned;
 }
 
-std::string DaemonProcess::spawn(const DaemonOrder& order) {
+Result<> DaemonProcess::spawn(const DaemonOrder& order) {
     if (order.arguments.empty()) {
-        return "there is no program to start";
+        return Error("there is no program to start");
     }
     std::vector<char*> arguments;
     for (const std::string& argument : order.arguments) {
@@ -74,29 +68,28 @@ std::string DaemonProcess::spawn(const DaemonOrder& order) {
     std::array<char*, 3> environment{path.data(), language.data(), nullptr};
     SpawnSetup setup;
     ::posix_spawn_file_actions_addopen(&setup.actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_, STDOUT_FILENO);
-    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_, STDERR_FILENO);
+    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_.get(), STDOUT_FILENO);
+    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_.get(), STDERR_FILENO);
     pid_t pid = 0;
     const int error = ::posix_spawn(&pid, arguments[0], &setup.actions, &setup.attributes, arguments.data(),
                                     environment.data());
     if (error != 0) {
-        return order.arguments[0] + " cannot be started: " + std::strerror(error);
+        return Error("cannot start " + order.arguments[0] + ": " + std::strerror(error));
     }
     // A child that has ended already cannot be identified any more, but keeps its pid until it is reaped.
     id_ = identifyProcess(pid).value_or(ProcessId{pid, 0});
-    return "";
+    return {};
 }
 
-std::string DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::time_point deadline) {
+Result<> DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::time_point deadline) {
     for (;;) {
         readOutput();
         int status = 0;
         if (::waitpid(id_.pid, &status, WNOHANG) == id_.pid) {
             return ended(status);
         }
-        if (std::all_of(order.ports.begin(), order.ports.end(),
-                        [this](int port) { return listensOn(id_.pid, port); })) {
-            return "";
+        if (std::ranges::all_of(order.ports, [this](int port) { return listensOn(id_.pid, port); })) {
+            return {};
         }
         if (Clock::now() >= deadline) {
             ::kill(id_.pid, SIGKILL); // our child, not reaped yet: the pid is its own
@@ -104,22 +97,23 @@ std::string DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::t
             readOutput();
             id_ = {};
             const std::string words = takeLastWords();
-            return "it did not listen on port " + listPorts(order.ports) + " in time" +
-                   (words.empty() ? "" : ": " + words);
+            return Error("it did not listen on port " + listPorts(order.ports) + " in time" +
+                         (words.empty() ? "" : ": " + words));
         }
-        pollfd output{readEnd_, POLLIN, 0};
+        pollfd output{readEnd_.get(), POLLIN, 0};
         ::poll(&output, 1, 2);
     }
 }
 
-std::string DaemonProcess::ended(int waitStatus) {
+Error DaemonProcess::ended(int waitStatus) {
     readOutput();
     id_ = {};
     std::string words = takeLastWords();
     if (WIFSIGNALED(waitStatus)) { // then its words were about something else
-        return "it was ended by signal " + std::to_string(WTERMSIG(waitStatus));
+        return Error("it was ended by signal " + std::to_string(WTERMSIG(waitStatus)));
     }
-    return words.empty() ? "it ended with status " + std::to_string(WEXITSTATUS(waitStatus)) : words;
+    return Error(words.empty() ? "it ended with status " + std::to_string(WEXITSTATUS(waitStatus))
+                               : std::move(words));
 }
 
 std::string DaemonProcess::takeLastWords() {
@@ -136,7 +130,7 @@ std::string DaemonProcess::takeLastWords() {
 void DaemonProcess::readOutput() {
     std::array<char, 4096> buffer{};
     for (;;) {
-        const ssize_t length = ::read(readEnd_, buffer.data(), buffer.size());
+        const ssize_t length = ::read(readEnd_.get(), buffer.data(), buffer.size());
         if (length <= 0) {
             return;
         }

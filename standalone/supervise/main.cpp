@@ -1,14 +1,14 @@
 // velt-supervise: keeps one daemon running.
 //
-//     velt-supervise DIRECTORY SERVICE CONFIGURATION PORTS PROGRAM [ARGUMENT...]
-//     velt-supervise DIRECTORY SERVICE
+//     velt-supervise FOLDER DAEMON CONFIGURATION PORTS PROGRAM [ARGUMENT...]
+//     velt-supervise FOLDER DAEMON
 //
-// DIRECTORY holds the state file, the lock and the control socket; PORTS are separated by commas;
+// FOLDER holds the state file, the lock and the control socket of DAEMON; PORTS are separated by commas;
 // CONFIGURATION identifies what the daemon is started for. The process that was started ends at once; its
 // child goes on and writes "ready", or "failed" and the reason, to descriptor 3.
 //
 // In the second form it is a service manager's: it stays in the foreground, finds what to start in
-// DIRECTORY's order file, and says how that went as sd_notify(3) describes it.
+// FOLDER's order file, and says how that went as sd_notify(3) describes it.
 
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/service_manager.h"
@@ -34,6 +34,10 @@
 
 namespace {
 
+using velt::DaemonOrder;
+using velt::Error;
+using velt::Result;
+
 constexpr int reportDescriptor = 3;
 
 std::optional<std::vector<int>> parsePorts(std::string_view text) {
@@ -55,18 +59,21 @@ std::optional<std::vector<int>> parsePorts(std::string_view text) {
     return ports;
 }
 
-std::optional<velt::DaemonOrder> readOrder(const std::string& directory, const std::string& service) {
-    std::ifstream file(velt::orderFile(directory, service), std::ios::binary);
+Result<DaemonOrder> readOrder(const std::string& folder, const std::string& daemon) {
+    std::ifstream file(velt::orderFile(folder, daemon), std::ios::binary);
     const auto request = velt::decodeRequest({std::istreambuf_iterator<char>(file), {}});
-    return request && request->command == velt::Command::start ? std::optional(request->order) : std::nullopt;
+    if (!request || request->command != velt::Command::start) {
+        return Error("nothing in " + folder + " says what to start");
+    }
+    return request->order;
 }
 
-void reportToManager(const std::string& reason) {
-    velt::tellServiceManager(reason.empty() ? "READY=1" : "STATUS=" + reason);
+void reportToManager(const Result<>& started) {
+    velt::tellServiceManager(started ? "READY=1" : "STATUS=" + started.error().message);
 }
 
-void reportToCaller(const std::string& reason) {
-    const std::string text = reason.empty() ? "ready" : "failed " + reason;
+void reportToCaller(const Result<>& started) {
+    const std::string text = started ? "ready" : "failed " + started.error().message;
     if (::write(reportDescriptor, text.data(), text.size()) < 0) {
         ::syslog(LOG_WARNING, "nobody heard: %s", text.c_str());
     }
@@ -82,7 +89,7 @@ void detach() {
     ::setsid();
     ::umask(S_IWGRP | S_IWOTH);
     if (::chdir("/") != 0) {
-        ::syslog(LOG_WARNING, "cannot leave the working directory: %s", std::strerror(errno));
+        ::syslog(LOG_WARNING, "cannot leave the working folder: %s", std::strerror(errno));
     }
     ::close_range(reportDescriptor + 1, ~0U, 0);
     ::fcntl(reportDescriptor, F_SETFD, FD_CLOEXEC);
@@ -94,38 +101,44 @@ void detach() {
     ::signal(SIGPIPE, SIG_IGN);
 }
 
-int supervise(const std::string& directory, const std::string& service, const velt::DaemonOrder& order,
-              void (*report)(const std::string&)) {
-    velt::Supervisor supervisor(directory, service);
-    const std::string reason = supervisor.begin(order);
-    report(reason);
-    if (!reason.empty()) {
+int supervise(const std::string& folder, const std::string& daemon, const DaemonOrder& order,
+              void (*report)(const Result<>&)) {
+    velt::Supervisor supervisor(folder, daemon);
+    const Result<> started = supervisor.begin(order);
+    report(started);
+    if (!started) {
         return 1;
     }
     supervisor.run();
     return 0;
 }
 
-int superviseForManager(const std::string& directory, const std::string& service) {
-    const auto order = readOrder(directory, service);
+int superviseForManager(const std::string& folder, const std::string& daemon) {
+    const auto order = readOrder(folder, daemon);
     if (!order) {
-        reportToManager("nothing in " + directory + " says what to start");
+        reportToManager(order.error());
         return 1;
     }
     ::umask(S_IWGRP | S_IWOTH);
     ::signal(SIGPIPE, SIG_IGN);
-    return supervise(directory, service, *order, reportToManager);
+    return supervise(folder, daemon, *order, reportToManager);
 }
 
 int superviseDetached(int argc, char** argv) {
     const auto ports = parsePorts(argv[4]);
     if (!ports) {
-        std::fprintf(stderr, "velt-supervise: \"%s\" are no ports\n", argv[4]);
+        std::fprintf(stderr, "velt-supervise: expected ports, not \"%s\"\n", argv[4]);
         return 2;
     }
-    const velt::DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
+    const DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
     detach();
     return supervise(argv[1], argv[2], order, reportToCaller);
+}
+
+/// What the daemon writes goes to syslog as well, the reasons of refused logins among it, so it is logged
+/// under the daemon's name: "velt-ftpd", "velt-sftpd".
+std::string logName(const std::string& daemon) {
+    return "velt-" + daemon + (daemon.ends_with('d') ? "" : "d");
 }
 
 } // namespace
@@ -134,15 +147,12 @@ int main(int argc, char** argv) {
     constexpr int managedArguments = 3;
     constexpr int fewestArguments = 6;
     if (argc != managedArguments && argc < fewestArguments) {
-        std::fputs("usage: velt-supervise DIRECTORY SERVICE [CONFIGURATION PORTS PROGRAM [ARGUMENT...]]\n",
+        std::fputs("usage: velt-supervise FOLDER DAEMON [CONFIGURATION PORTS PROGRAM [ARGUMENT...]]\n",
                    stderr);
         return 2;
     }
-    // What the daemons write goes there as well, the reasons of refused logins among it, so it is under their
-    // names.
-    const std::string ident =
-        std::string_view(argv[2]) == "sftp" ? "velt-sftpd" : std::string("velt-") + argv[2];
-    ::openlog(ident.c_str(), LOG_PID, LOG_DAEMON);
+    const std::string name = logName(argv[2]);
+    ::openlog(name.c_str(), LOG_PID, LOG_DAEMON);
     try {
         return argc == managedArguments ? superviseForManager(argv[1], argv[2])
                                         : superviseDetached(argc, argv);

@@ -1,5 +1,7 @@
 #include "standalone/supervise/service_manager.h"
 
+#include "base/unique_fd.h"
+
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <syslog.h>
@@ -26,13 +28,10 @@ void tellServiceManager(const std::string& assignments) {
         address.sun_path[0] = '\0';
     }
     const auto size = static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + path.size());
-    const int descriptor = ::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
-    if (descriptor < 0 || ::sendto(descriptor, assignments.data(), assignments.size(), MSG_NOSIGNAL,
-                                   reinterpret_cast<const sockaddr*>(&address), size) < 0) {
-        ::syslog(LOG_WARNING, "the service manager does not hear: %s", std::strerror(errno));
-    }
-    if (descriptor >= 0) {
-        ::close(descriptor);
+    const UniqueFd socket(::socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0));
+    if (::sendto(socket.get(), assignments.data(), assignments.size(), MSG_NOSIGNAL,
+                 reinterpret_cast<const sockaddr*>(&address), size) < 0) {
+        ::syslog(LOG_WARNING, "cannot reach the service manager: %s", std::strerror(errno));
     }
 }
 

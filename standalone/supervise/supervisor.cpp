@@ -30,23 +30,23 @@ constexpr milliseconds longestBackOff{30000};
 constexpr milliseconds steadyRun{10000}; ///< a daemon that ran this long is not in a loop of crashes
 constexpr milliseconds patience{2000};   ///< between SIGTERM and SIGKILL
 
-int openSignals() {
+UniqueFd openSignals() {
     sigset_t wanted;
     sigemptyset(&wanted);
     for (const int number : {SIGCHLD, SIGTERM, SIGINT, SIGHUP}) {
         sigaddset(&wanted, number);
     }
     ::sigprocmask(SIG_BLOCK, &wanted, nullptr);
-    return ::signalfd(-1, &wanted, SFD_CLOEXEC | SFD_NONBLOCK);
+    return UniqueFd(::signalfd(-1, &wanted, SFD_CLOEXEC | SFD_NONBLOCK));
 }
 
-/// For those who look at the unit and find it active: that is the supervisor.
-std::string statusLine(const ServiceState& state) {
+/// For administrators who look at the unit: it is active as long as the supervisor runs.
+std::string statusLine(const DaemonState& state) {
     switch (state.state) {
     case RunState::running:
         return "STATUS=the daemon serves";
     case RunState::paused:
-        return "STATUS=paused, only sessions of before go on";
+        return "STATUS=paused: only the sessions that were open go on";
     case RunState::failed:
         return "STATUS=the daemon does not serve: " + state.reason;
     case RunState::stopped:
@@ -57,61 +57,59 @@ std::string statusLine(const ServiceState& state) {
 
 } // namespace
 
-Supervisor::Supervisor(std::filesystem::path directory, std::string service)
-    : directory_(std::move(directory)), service_(std::move(service)), backOff_(shortestBackOff) {}
+Supervisor::Supervisor(std::filesystem::path folder, std::string name)
+    : folder_(std::move(folder)), name_(std::move(name)), backOff_(shortestBackOff) {}
 
-Supervisor::~Supervisor() {
-    if (signals_ >= 0) {
-        ::close(signals_);
-    }
-    if (lock_ >= 0) {
-        ::close(lock_);
-    }
-}
-
-std::string Supervisor::begin(const DaemonOrder& order) {
+Result<> Supervisor::begin(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;
-    if (!takeLock()) {
-        return "another supervisor of this service runs";
+    if (const auto locked = takeLock(); !locked) {
+        return locked;
     }
     ::prctl(PR_SET_CHILD_SUBREAPER, 1);
     signals_ = openSignals();
-    const auto former = readServiceState(stateFile(directory_, service_));
+    if (!signals_) {
+        return Error(std::string("cannot wait for signals: ") + std::strerror(errno));
+    }
+    const auto former = readDaemonState(stateFile(folder_, name_));
     if (former && !endLeftovers(*former)) {
-        return "the former daemon, process " + std::to_string(former->daemon.pid) + ", does not end";
+        return Error("the former daemon, process " + std::to_string(former->daemon.pid) + ", does not end");
     }
-    control_.emplace(directory_, service_);
-    if (signals_ < 0 || control_->descriptor() < 0) {
-        return "the supervisor cannot make its control socket in " + directory_.string();
+    auto control = ControlListener::open(folder_, name_);
+    if (!control) {
+        return control.error();
     }
+    control_.emplace(std::move(*control));
     order_ = order;
-    std::string reason = startDaemon(deadline);
-    if (!reason.empty()) {
+    auto started = startDaemon(deadline);
+    if (!started) {
         control_.reset();
         endProcesses([] { return descendantsOf(::getpid()); }, patience);
         finished_ = true;
-        publish(RunState::failed, reason);
+        publish(RunState::failed, started.error().message);
     }
-    return reason;
+    return started;
 }
 
-bool Supervisor::takeLock() {
-    const std::filesystem::path file = lockFile(directory_, service_);
-    lock_ = ::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR);
-    return lock_ >= 0 && ::flock(lock_, LOCK_EX | LOCK_NB) == 0;
+Result<> Supervisor::takeLock() {
+    const std::filesystem::path file = lockFile(folder_, name_);
+    lock_ = UniqueFd(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
+    if (!lock_) {
+        return Error("cannot open " + file.string() + ": " + std::strerror(errno));
+    }
+    return ::flock(lock_.get(), LOCK_EX | LOCK_NB) == 0 ? Result<>() : Error("another supervisor of it is running");
 }
 
-std::string Supervisor::startDaemon(Clock::time_point deadline) {
+Result<> Supervisor::startDaemon(Clock::time_point deadline) {
     restartAt_.reset();
-    std::string reason = daemon_.start(order_, deadline);
+    auto started = daemon_.start(order_, deadline);
     startedAt_ = Clock::now();
-    publish(reason.empty() ? RunState::running : RunState::failed, reason);
-    return reason;
+    publish(started ? RunState::running : RunState::failed, started ? "" : started.error().message);
+    return started;
 }
 
 void Supervisor::run() {
     while (!finished_) {
-        std::array<pollfd, 3> events{{{signals_, POLLIN, 0},
+        std::array<pollfd, 3> events{{{signals_.get(), POLLIN, 0},
                                       {control_->descriptor(), POLLIN, 0},
                                       {daemon_.outputDescriptor(), POLLIN, 0}}};
         ::poll(events.data(), events.size(), millisecondsToRestart());
@@ -130,7 +128,7 @@ void Supervisor::run() {
     }
 }
 
-std::string Supervisor::handle(const ControlRequest& request) {
+Result<> Supervisor::handle(const ControlRequest& request) {
     reapChildren(); // the daemon may have ended a moment ago
     switch (request.command) {
     case Command::start:
@@ -140,56 +138,57 @@ std::string Supervisor::handle(const ControlRequest& request) {
     case Command::stop:
         return stop();
     }
-    return "the command is unknown";
+    return Error("the command is unknown");
 }
 
-std::string Supervisor::replaceDaemon(const DaemonOrder& order) {
+Result<> Supervisor::replaceDaemon(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;
     const bool unchanged =
         state_ == RunState::running && daemon_.id() && order.configurationHash == order_.configurationHash;
     if (unchanged) {
-        return "";
+        return {};
     }
-    if (!endDaemon()) {
-        return "the former daemon, process " + std::to_string(daemon_.id().pid) + ", does not end";
+    if (const auto ended = endDaemon(); !ended) {
+        return ended;
     }
     order_ = order;
     backOff_ = shortestBackOff;
-    // A failed start is not tried again: whoever asked for it hears of it and decides.
+    // A failed start is not tried again: the caller hears of it and decides.
     return startDaemon(deadline);
 }
 
-std::string Supervisor::pause() {
+Result<> Supervisor::pause() {
     restartAt_.reset();
-    if (!endDaemon()) {
-        return "the daemon, process " + std::to_string(daemon_.id().pid) + ", does not end";
+    auto ended = endDaemon();
+    if (ended) {
+        publish(RunState::paused);
     }
-    publish(RunState::paused);
-    return "";
+    return ended;
 }
 
-std::string Supervisor::stop() {
+Result<> Supervisor::stop() {
     restartAt_.reset();
     const bool ended = endProcesses([] { return descendantsOf(::getpid()); }, patience);
     settleDaemon();
     if (!ended) {
-        return "some of its processes do not end";
+        return Error("some of its processes do not end");
     }
     std::error_code ignored;
-    std::filesystem::remove(stateFile(directory_, service_), ignored);
+    std::filesystem::remove(stateFile(folder_, name_), ignored);
     finished_ = true;
-    return "";
+    return {};
 }
 
-bool Supervisor::endDaemon() {
+Result<> Supervisor::endDaemon() {
     const ProcessId daemon = daemon_.id();
     if (!daemon) {
-        return true;
+        return {};
     }
     const bool ended = endProcesses(
         [&daemon] { return isAlive(daemon) ? std::vector{daemon} : std::vector<ProcessId>(); }, patience);
     settleDaemon();
-    return ended;
+    return ended ? Result<>()
+                 : Error("the running daemon, process " + std::to_string(daemon.pid) + ", does not end");
 }
 
 /// Takes note of an end that was asked for, before reapChildren() sees it and has the daemon started again.
@@ -203,11 +202,11 @@ void Supervisor::settleDaemon() {
 void Supervisor::onSignals() {
     signalfd_siginfo signal{};
     bool asked = false;
-    while (::read(signals_, &signal, sizeof signal) == static_cast<ssize_t>(sizeof signal)) {
+    while (::read(signals_.get(), &signal, sizeof signal) == static_cast<ssize_t>(sizeof signal)) {
         asked = asked || signal.ssi_signo == SIGTERM || signal.ssi_signo == SIGINT;
     }
     if (asked) {
-        stop();
+        (void)stop(); // what does not end now is left to the next supervisor
         finished_ = true;
         return;
     }
@@ -224,24 +223,26 @@ void Supervisor::reapChildren() {
 }
 
 void Supervisor::onDaemonEnd(int waitStatus) {
-    const std::string reason = daemon_.ended(waitStatus);
+    const std::string reason = daemon_.ended(waitStatus).message;
     if (Clock::now() - startedAt_ >= steadyRun) {
         backOff_ = shortestBackOff;
     }
-    ::syslog(LOG_ERR, "the daemon of %s is started again: %s", service_.c_str(), reason.c_str());
-    restartAt_ = Clock::now() + backOff_;
-    backOff_ = std::min(backOff_ * 2, longestBackOff);
+    ::syslog(LOG_ERR, "%s has ended and is started again: %s", name_.c_str(), reason.c_str());
+    restartLater();
     publish(RunState::failed, reason);
 }
 
 void Supervisor::restartDaemon() {
     ++restarts_;
-    const std::string reason = startDaemon(Clock::now() + startLimit);
-    if (!reason.empty()) {
-        ::syslog(LOG_ERR, "the daemon of %s does not start: %s", service_.c_str(), reason.c_str());
-        restartAt_ = Clock::now() + backOff_;
-        backOff_ = std::min(backOff_ * 2, longestBackOff);
+    if (const auto started = startDaemon(Clock::now() + startLimit); !started) {
+        ::syslog(LOG_ERR, "%s does not start: %s", name_.c_str(), started.error().message.c_str());
+        restartLater();
     }
+}
+
+void Supervisor::restartLater() {
+    restartAt_ = Clock::now() + backOff_;
+    backOff_ = std::min(backOff_ * 2, longestBackOff);
 }
 
 int Supervisor::millisecondsToRestart() const {
@@ -254,7 +255,7 @@ int Supervisor::millisecondsToRestart() const {
 
 void Supervisor::publish(RunState state, std::string reason) {
     state_ = state;
-    ServiceState record;
+    DaemonState record;
     record.state = state;
     if (!finished_) { // who is named there and gone was killed
         record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
@@ -267,8 +268,8 @@ void Supervisor::publish(RunState state, std::string reason) {
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);
     tellServiceManager(statusLine(record));
-    if (!writeServiceState(stateFile(directory_, service_), record)) {
-        ::syslog(LOG_ERR, "the state of %s cannot be written: %s", service_.c_str(), std::strerror(errno));
+    if (const auto written = writeDaemonState(stateFile(folder_, name_), record); !written) {
+        ::syslog(LOG_ERR, "%s", written.error().message.c_str());
     }
 }
 

@@ -2,9 +2,11 @@
 #ifndef VELT_STANDALONE_SUPERVISE_SUPERVISOR_H
 #define VELT_STANDALONE_SUPERVISE_SUPERVISOR_H
 
+#include "base/result.h"
+#include "base/unique_fd.h"
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/daemon_process.h"
-#include "standalone/supervise/service_state.h"
+#include "standalone/supervise/daemon_state.h"
 
 #include <chrono>
 #include <cstdint>
@@ -20,40 +22,38 @@ namespace velt {
 /// file.
 class Supervisor {
 public:
-    Supervisor(std::filesystem::path directory, std::string service);
-    ~Supervisor();
-    Supervisor(const Supervisor&) = delete;
-    Supervisor& operator=(const Supervisor&) = delete;
+    Supervisor(std::filesystem::path folder, std::string name);
 
-    /// Becomes the service's only supervisor, ends what a former one left, and starts the daemon: "" on
-    /// success, else the reason in one line, and nothing runs.
-    std::string begin(const DaemonOrder& order);
+    /// Becomes the daemon's only supervisor, ends what a former one left, and starts the daemon. On failure
+    /// nothing runs.
+    Result<> begin(const DaemonOrder& order);
 
-    /// Returns when the service was stopped.
+    /// Returns when the daemon was stopped.
     void run();
 
 private:
     using Clock = DaemonProcess::Clock;
 
-    bool takeLock();
-    std::string startDaemon(Clock::time_point deadline);
-    std::string handle(const ControlRequest& request);
-    std::string replaceDaemon(const DaemonOrder& order);
-    std::string pause();
-    std::string stop();
-    bool endDaemon();
+    Result<> takeLock();
+    Result<> startDaemon(Clock::time_point deadline);
+    Result<> handle(const ControlRequest& request);
+    Result<> replaceDaemon(const DaemonOrder& order);
+    Result<> pause();
+    Result<> stop();
+    Result<> endDaemon();
     void settleDaemon();
     void onSignals();
     void reapChildren();
     void onDaemonEnd(int waitStatus);
     void restartDaemon();
     int millisecondsToRestart() const;
+    void restartLater();
     void publish(RunState state, std::string reason = {});
 
-    std::filesystem::path directory_;
-    std::string service_;
-    int lock_ = -1;
-    int signals_ = -1;
+    std::filesystem::path folder_;
+    std::string name_;
+    UniqueFd lock_;
+    UniqueFd signals_;
     DaemonProcess daemon_;
     std::optional<ControlListener> control_;
     DaemonOrder order_;

@@ -62,8 +62,8 @@ void prepare(const World& world) {
     ::chmod(root()->path().c_str(), 0755);
     ::setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
     prepareAccounts(world);
-    if (velt::openState(root()->path()) < 0) {
-        throw std::runtime_error(velt::lastErrorSentence());
+    if (const auto opened = velt::openState(root()->path()); !opened) {
+        throw std::runtime_error(opened.error().message);
     }
     if (const auto stored = prepareShares(world); !stored) {
         throw std::runtime_error(stored.error().message);

@@ -90,21 +90,31 @@ void FakeStandalone::announce(const std::string& service, const std::string& act
 
 namespace velt {
 
-int startEnabledServices() {
+Result<> startEnabledServices() {
     FakeStandalone& fake = FakeStandalone::instance();
     ++fake.starts;
     if (fake.startHelps) {
         fake.down.clear();
     }
-    return fake.down.empty() ? 0 : -1;
+    return fake.down.empty() ? Result<>() : Error(fake.down.front().reason);
 }
 
 std::vector<ServiceDown> servicesDown() {
     return FakeStandalone::instance().down;
 }
 
-std::uint64_t daemonRestarts(const std::string& service) {
-    return FakeStandalone::instance().restarts[service];
+std::vector<StoredService> storedServices() {
+    const auto& platform = fake::Platform::instance();
+    const auto ifReadable = [](bool on) {
+        return FakeStandalone::instance().settingsFail ? std::nullopt : std::optional(on);
+    };
+    return {{"ftp", "ftp", ifReadable((platform.conf.service_flags & VELT_FTP_SERVICE_PLAIN) != 0), 21},
+            {"ftps", "ftp", ifReadable((platform.conf.service_flags & VELT_FTP_SERVICE_TLS) != 0), 21},
+            {"sftp", "sftp", ifReadable(platform.sftp.enable != 0), 22}};
+}
+
+std::map<std::string, std::uint64_t> daemonRestarts() {
+    return FakeStandalone::instance().restarts;
 }
 
 void clearLastError() {

@@ -19,6 +19,7 @@ struct FakeStandalone {
     std::string sentence;            ///< of the last error of the requests to come
     velt::PortConflict conflict;     ///< that is found
     bool storeFails = false;
+    bool settingsFail = false;           ///< those of the services cannot be read
     std::vector<velt::ServiceDown> down; ///< services that are switched on and do not run
     bool startHelps = false;             ///< and run once they are started
     int starts = 0;                      ///< how often the host started what is switched on

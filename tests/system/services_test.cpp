@@ -2,11 +2,12 @@
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
-#include "standalone/control/services.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/process/run_program.h"
 #include "standalone/standalone.h"
+#include "tests/standalone/support/daemon_states.h"
+#include "tests/support/result.h"
 #include "tests/system/support/ftp_service.h"
 #include "tests/system/support/private_world.h"
 
@@ -80,7 +81,7 @@ protected:
     static bool isBack(const std::string& service, const ProcessId& former) {
         const auto end = std::chrono::steady_clock::now() + seconds(2);
         while (std::chrono::steady_clock::now() < end) {
-            const ServiceState state = serviceState(service);
+            const DaemonState state = serviceState(service);
             if (state.daemon != former && isServing(state)) {
                 return true;
             }
@@ -221,7 +222,7 @@ TEST_F(ControlledSftp, aStopEndsTheTransfer) {
 TEST_F(ControlledSftp, afterABootBothServicesStart) {
     record.service_flags = VELT_FTP_SERVICE_TLS | VELT_FTP_SERVICE_PLAIN;
     ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
-    EXPECT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(startEnabledServices()), "");
     EXPECT_TRUE(servesFtp(2121));
     EXPECT_NE(VELTSFTPIsAlive(), 0);
     const ProcessId sshd = serviceState("sftp").daemon;

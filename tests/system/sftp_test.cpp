@@ -2,6 +2,7 @@
 #include "platform/sftp.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/process/run_program.h"
 #include "standalone/rules/rule_store.h"
 #include "tests/support/result.h"
@@ -52,9 +53,9 @@ protected:
         daemon_.stop();
         ASSERT_EQ(VELTSFTPConfigSet(1, atPort), 0) << lastErrorSentence();
         const auto plan = planSftpDaemon();
-        ASSERT_TRUE(plan) << lastErrorSentence();
-        EXPECT_EQ(plan->listenPorts, std::vector<int>{atPort});
-        ASSERT_TRUE(daemon_.start(*plan));
+        ASSERT_EQ(messageOf(plan), "");
+        EXPECT_EQ((*plan)->order.ports, std::vector<int>{atPort});
+        ASSERT_TRUE(daemon_.start((*plan)->order));
         std::string known;
         for (const char* kind : {"ed25519", "rsa"}) {
             known +=

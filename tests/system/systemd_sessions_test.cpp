@@ -31,7 +31,7 @@ TEST_F(UnderSystemd, aTransferOutlivesAPauseAndAMove) {
         EXPECT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
         EXPECT_EQ(VELTSFTPIsAlive(), 0);
         EXPECT_NE(logInBySftp(2222).exitCode, 0);
-        EXPECT_EQ(unitProperty("velt-sftp.service", "StatusText"), "paused, only sessions of before go on");
+        EXPECT_EQ(unitProperty("velt-sftp.service", "StatusText"), "paused: only the sessions that were open go on");
         storeSftp(true, 2223);
         EXPECT_EQ(VLIBServiceResume("sftp"), 0) << lastErrorSentence();
         EXPECT_EQ(logInBySftp(2223).exitCode, 0);
@@ -44,7 +44,7 @@ TEST_F(UnderSystemd, aStopEndsSessionsWhereverTheyWereMoved) {
         startSftp();
         for (const bool paused : {false, true}) {
             SlowTransfer transfer(2222);
-            const ServiceState state = serviceState("sftp");
+            const DaemonState state = serviceState("sftp");
             if (fs::exists("/lib/systemd/system/systemd-logind.service")) {
                 const auto sessions = descendantsOf(state.daemon.pid);
                 ASSERT_FALSE(sessions.empty());
@@ -81,7 +81,7 @@ TEST_F(UnderSystemd, aStopEndsTheSessionsOfASupervisorThatWasKilled) {
     inside([] {
         startSftp();
         SlowTransfer transfer(2222);
-        const ServiceState before = serviceState("sftp");
+        const DaemonState before = serviceState("sftp");
         signalProcess(before.supervisor, SIGKILL);
         ASSERT_TRUE(isBack("sftp", before.daemon));
         EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();

@@ -2,7 +2,7 @@
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
-#include "standalone/control/supervise_backend.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/control/systemd_launcher.h"
 #include "standalone/core/last_error.h"
 #include "standalone/shares/share_store.h"
@@ -31,7 +31,7 @@ TEST_F(UnderSystemd, theFtpDaemonFollowsTheStoredSettings) {
         EXPECT_EQ(fetchByFtp(), "alice");
         EXPECT_EQ(unitState("velt-ftpd.service"), "active");
         EXPECT_EQ(textOf("/etc/velt/run-keys/ftpd"), "1\n");
-        const ServiceState first = serviceState("ftpd");
+        const DaemonState first = serviceState("ftpd");
         EXPECT_EQ(unitProperty("velt-ftpd.service", "MainPID"), std::to_string(first.supervisor.pid));
         for (const char* name : {"ftpd", "ftpd-pure", "ftpd-ssl"}) {
             EXPECT_EQ(VLIBServicectlStart(name, 0), 0) << lastErrorSentence();
@@ -73,26 +73,23 @@ TEST_F(UnderSystemd, manyChangesInARowAreNoCrashes) {
 TEST_F(UnderSystemd, aStartThatFailsSaysWhyWithinFiveSeconds) {
     inside([] {
         openMachine();
-        SuperviseBackend backend("ftpd", std::make_unique<SystemdLauncher>("ftpd"));
+        SupervisedDaemon ftp(ftpDaemon, std::make_unique<SystemdLauncher>(ftpDaemon));
         std::ofstream("/run/wrong.conf") << "Prot 21\n";
-        DaemonPlan plan;
-        plan.arguments = {"/usr/sbin/proftpd", "-n", "-c", "/run/wrong.conf"};
-        plan.configurationHash = "wrong";
-        plan.listenPorts = {21};
-        EXPECT_LT(backend.start(plan), 0);
-        EXPECT_EQ(lastErrorSentence(), "The FTP daemon does not start: unknown configuration directive "
-                                       "'Prot' on line 1 of '/run/wrong.conf'.");
+        DaemonOrder order{"wrong", {21}, {"/usr/sbin/proftpd", "-n", "-c", "/run/wrong.conf"}};
+        EXPECT_EQ(messageOf(ftp.start(order)),
+                  "The FTP daemon does not start: unknown configuration directive "
+                  "'Prot' on line 1 of '/run/wrong.conf'.");
         EXPECT_NE(unitState("velt-ftpd.service"), "active");
 
         const auto began = std::chrono::steady_clock::now();
-        plan.arguments = {"/bin/sleep", "60"};
-        EXPECT_LT(backend.start(plan), 0);
+        order.arguments = {"/bin/sleep", "60"};
+        const std::string refusal = messageOf(ftp.start(order));
         EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(5200));
-        EXPECT_NE(lastErrorSentence().find("in time"), std::string::npos) << lastErrorSentence();
+        EXPECT_NE(refusal.find("in time"), std::string::npos) << refusal;
         EXPECT_NE(runProcess({"pidof", "sleep"}).exitCode, 0) << "it still runs";
 
         EXPECT_EQ(unitState("velt-ftpd.service"), "failed");
-        EXPECT_EQ(backend.stop(), 0) << lastErrorSentence();
+        EXPECT_EQ(messageOf(ftp.stop()), "");
         EXPECT_EQ(unitState("velt-ftpd.service"), "inactive") << "what is switched off is no failure";
         storeFtp(plain);
         EXPECT_EQ(VLIBServiceStart("ftpd", 0), 0) << "a failure is over: " << lastErrorSentence();
@@ -105,15 +102,15 @@ TEST_F(UnderSystemd, whatWasKilledIsBackWithinTwoSeconds) {
         openMachine();
         storeFtp(plain);
         storeSftp(true);
-        ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+        ASSERT_EQ(messageOf(startEnabledServices()), "");
         for (const char* service : {"ftpd", "sftp"}) {
-            const ServiceState before = serviceState(service);
+            const DaemonState before = serviceState(service);
             signalProcess(before.daemon, SIGKILL);
             EXPECT_TRUE(isBack(service, before.daemon)) << service;
             EXPECT_EQ(serviceState(service).supervisor, before.supervisor);
         }
         for (const char* service : {"ftpd", "sftp"}) {
-            const ServiceState before = serviceState(service);
+            const DaemonState before = serviceState(service);
             signalProcess(before.supervisor, SIGKILL);
             EXPECT_TRUE(isBack(service, before.daemon)) << service << " after its supervisor was killed";
             EXPECT_NE(serviceState(service).supervisor, before.supervisor);
@@ -131,7 +128,7 @@ TEST_F(UnderSystemd, aKilledSupervisorComesBackForTheLastSettingsAndNotAfterASto
         ASSERT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
         storeSftp(true, 2223);
         ASSERT_EQ(VLIBServiceResume("sftp"), 0) << lastErrorSentence();
-        const ServiceState moved = serviceState("sftp");
+        const DaemonState moved = serviceState("sftp");
         signalProcess(moved.supervisor, SIGKILL);
         ASSERT_TRUE(isBack("sftp", moved.daemon));
         EXPECT_EQ(serviceState("sftp").ports, std::vector{2223});

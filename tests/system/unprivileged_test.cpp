@@ -3,6 +3,8 @@
 
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "tests/support/result.h"
 
 #include <crypt.h>
 #include <grp.h>
@@ -56,12 +58,12 @@ protected:
             _exit(1);
         }
         const auto plan = planFtpDaemon();
-        if (!plan) {
-            std::cerr << lastErrorSentence() << '\n';
+        if (!plan || !*plan) {
+            std::cerr << messageOf(plan) << '\n';
             _exit(1);
         }
         std::vector<char*> arguments;
-        for (const auto& argument : plan->arguments) {
+        for (const auto& argument : (*plan)->order.arguments) {
             arguments.push_back(const_cast<char*>(argument.c_str()));
         }
         arguments.push_back(nullptr);

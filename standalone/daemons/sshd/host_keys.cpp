@@ -1,13 +1,12 @@
 #include "standalone/daemons/sshd/host_keys.h"
-
 #include "base/file.h"
-#include "standalone/core/boundary.h"
+
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
+#include "standalone/core/scratch_folder.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemons/configuration_test.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 
@@ -22,25 +21,28 @@ namespace {
 
 constexpr std::array<std::string_view, 2> kinds{"ed25519", "rsa"};
 
+Result<> storeCopy(const std::filesystem::path& from, const std::filesystem::path& to, mode_t mode) {
+    const auto text = readFile(from);
+    return text ? replaceFile(to, *text, mode) : text.error();
+}
+
 // ssh-keygen writes in place, so the key is made aside and stored whole; the public half comes first, so
-// that a private key never stands alone.
-int makeKey(const std::string& kind, const std::filesystem::path& place) {
-    const ScratchFolder scratch;
+// that a private key is never there without it.
+Result<> makeKey(const std::string& kind, const std::filesystem::path& place) {
+    const auto scratch = ScratchFolder::make();
     if (!scratch) {
-        return -1;
+        return scratch.error();
     }
-    const auto made = scratch.path() / "key";
+    const auto made = scratch->path() / "key";
     const auto result =
         runProcess({"/usr/bin/ssh-keygen", "-q", "-t", kind, "-N", "", "-C", "", "-f", made.string()}, {},
                    std::chrono::seconds(60));
-    const auto key = readFile(made);
-    const auto publicKey = readFile(made.string() + ".pub");
-    if (result.exitCode != 0 || !key || !publicKey) {
-        return fail(ErrorNumber::daemon,
-                    "No host key can be made for SFTP: " + lastWords(result.errors) + ".");
+    if (result.exitCode != 0) {
+        return Error(ErrorNumber::daemon,
+                     "Cannot make a host key for SFTP: " + lastWords(result.errors) + ".");
     }
-    const auto stored = replaceFile(place.string() + ".pub", *publicKey, 0644);
-    return toContract(stored ? replaceFile(place, *key, 0600) : stored);
+    const auto stored = storeCopy(made.string() + ".pub", place.string() + ".pub", 0644);
+    return stored ? storeCopy(made, place, 0600) : stored;
 }
 
 std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {
@@ -57,41 +59,45 @@ bool isThere(const std::filesystem::path& path) {
     return std::filesystem::exists(path, error);
 }
 
-int makeMissing(const std::vector<std::filesystem::path>& keys) {
+Result<> makeMissing(const std::vector<std::filesystem::path>& keys) {
     for (std::size_t i = 0; i < keys.size(); i++) {
-        if (!isThere(keys[i]) && makeKey(std::string(kinds[i]), keys[i]) < 0) {
-            return -1;
+        if (isThere(keys[i])) {
+            continue;
+        }
+        if (const auto made = makeKey(std::string(kinds[i]), keys[i]); !made) {
+            return made;
         }
     }
-    return 0;
+    return {};
 }
 
-// Something has to stand in the configuration that a daemon is to test, also where nothing may be stored.
-std::optional<std::vector<std::filesystem::path>> throwAwayKeys() {
-    thread_local std::unique_ptr<ScratchFolder> folder;
-    folder = std::make_unique<ScratchFolder>();
-    if (!*folder) {
-        return std::nullopt;
+// A configuration under test names keys also where none may be stored.
+Result<HostKeys> throwAwayKeys() {
+    auto folder = ScratchFolder::make();
+    if (!folder) {
+        return folder.error();
     }
-    auto keys = keysIn(folder->path());
-    return makeMissing(keys) == 0 ? std::optional(std::move(keys)) : std::nullopt;
+    HostKeys keys{keysIn(folder->path()), std::make_shared<ScratchFolder>(std::move(*folder))};
+    const auto made = makeMissing(keys.files);
+    return made ? Result<HostKeys>(std::move(keys)) : made.error();
 }
 
 } // namespace
 
-std::optional<std::vector<std::filesystem::path>> hostKeys() {
-    const StateLock lock;
+Result<HostKeys> hostKeys() {
+    const auto lock = StateLock::take();
     if (!lock) {
-        return std::nullopt;
+        return lock.error();
     }
-    auto keys = keysIn(statePath(paths::hostKeys));
-    if (std::ranges::all_of(keys, isThere)) {
+    HostKeys keys{keysIn(statePath(paths::hostKeys)), nullptr};
+    if (std::ranges::all_of(keys.files, isThere)) {
         return keys;
     }
-    if (perform(Effect::store, "host keys", [&] { return makeMissing(keys); }) < 0) {
-        return std::nullopt;
+    const auto stored = perform(Effect::store, "host keys", [&] { return makeMissing(keys.files); });
+    if (!stored) {
+        return stored.error();
     }
-    return std::ranges::all_of(keys, isThere) ? std::optional(std::move(keys)) : throwAwayKeys();
+    return std::ranges::all_of(keys.files, isThere) ? Result<HostKeys>(std::move(keys)) : throwAwayKeys();
 }
 
 } // namespace velt

@@ -2,17 +2,25 @@
 #ifndef VELT_STANDALONE_DAEMONS_SSHD_HOST_KEYS_H
 #define VELT_STANDALONE_DAEMONS_SSHD_HOST_KEYS_H
 
+#include "base/result.h"
+
 #include <filesystem>
-#include <optional>
+#include <memory>
 #include <vector>
 
 namespace velt {
 
-/// The private host keys, Ed25519 and RSA, below "/var/lib/velt/ssh" of the state root; a missing one is
-/// made. Where the thread's hook leaves the store of them undone, throw-away ones that last until the
-/// thread's next call or its end. They are not those of an SSH service that the server may run besides.
-/// Nothing, with the last error set, when a key cannot be made. Thread-safe.
-std::optional<std::vector<std::filesystem::path>> hostKeys();
+class ScratchFolder;
+
+struct HostKeys {
+    std::vector<std::filesystem::path> files;       ///< the private halves, Ed25519 and RSA
+    std::shared_ptr<const ScratchFolder> throwAway; ///< holds the files when they are for a test only
+};
+
+/// The host keys below "/var/lib/velt/ssh" of the state root; a missing one is made. Where the thread's hook
+/// leaves the store of them undone, throw-away ones that are gone with the result. They are not those of an
+/// SSH service that the server may run besides. Thread-safe.
+Result<HostKeys> hostKeys();
 
 } // namespace velt
 

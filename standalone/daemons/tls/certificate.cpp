@@ -2,13 +2,12 @@
 
 #include "base/file.h"
 #include "base/sha256.h"
-#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
+#include "standalone/core/scratch_folder.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemons/configuration_test.h"
 #include "standalone/daemons/tls/openssl_owners.h"
 #include "standalone/daemons/tls/self_signed.h"
 
@@ -42,13 +41,12 @@ KeyOwner parseKey(const std::string& text) {
     return KeyOwner(bio ? PEM_read_bio_PrivateKey(bio.get(), nullptr, noPassphrase, nullptr) : nullptr);
 }
 
-std::optional<ServerCertificate> refuse(const std::filesystem::path& file, const std::string& why) {
+Error refuse(const std::filesystem::path& file, const std::string& why) {
     ERR_clear_error();
-    fail(ErrorNumber::invalid, "The file " + file.string() + " " + why + ".");
-    return std::nullopt;
+    return {ErrorNumber::invalid, "The file " + file.string() + " " + why + "."};
 }
 
-std::optional<ServerCertificate> load(const Pair& pair) {
+Result<ServerCertificate> load(const Pair& pair) {
     const auto certificateText = readFile(pair.certificate);
     if (!certificateText) {
         return refuse(pair.certificate, "cannot be read");
@@ -89,26 +87,29 @@ bool isUsable(const Pair& pair) {
     return usable;
 }
 
-int makeOwn(const Pair& pair) {
+Result<> makeOwn(const Pair& pair) {
     const auto made = makeSelfSigned(namesOfThisHost());
     if (!made) {
-        ERR_clear_error();
-        return fail(ErrorNumber::daemon, "The OpenSSL library cannot make a certificate for this server.");
+        return made.error();
     }
-    const auto stored = replaceFile(pair.key, made->key, 0600);
-    return toContract(stored ? replaceFile(pair.certificate, made->certificate, 0644) : stored);
+    const auto key = replaceFile(pair.key, made->key, 0600);
+    return key ? replaceFile(pair.certificate, made->certificate, 0644) : key;
 }
 
-// Something has to stand in the configuration that a daemon is to test, also where nothing may be stored.
-std::optional<ServerCertificate> throwAway() {
-    auto folder = std::make_shared<ScratchFolder>();
+// A configuration under test names a certificate also where none may be stored.
+Result<ServerCertificate> throwAway() {
+    auto made = ScratchFolder::make();
+    if (!made) {
+        return made.error();
+    }
+    const auto folder = std::make_shared<ScratchFolder>(std::move(*made));
     const Pair pair{folder->path() / "server.crt", folder->path() / "server.key"};
-    if (!*folder || makeOwn(pair) < 0) {
-        return std::nullopt;
+    if (const auto own = makeOwn(pair); !own) {
+        return own.error();
     }
     auto certificate = load(pair);
     if (certificate) {
-        certificate->throwAway = std::move(folder);
+        certificate->throwAway = folder;
     }
     return certificate;
 }
@@ -120,21 +121,21 @@ bool isThere(const std::filesystem::path& path) {
 
 } // namespace
 
-std::optional<ServerCertificate> serverCertificate() {
+Result<ServerCertificate> serverCertificate() {
     const Pair given{statePath(paths::givenCertificate), statePath(paths::givenKey)};
     if (isThere(given.certificate) || isThere(given.key)) {
         return load(given);
     }
     const Pair own{statePath(paths::ownCertificate), statePath(paths::ownKey)};
-    const StateLock lock;
+    const auto lock = StateLock::take();
     if (!lock) {
-        return std::nullopt;
+        return lock.error();
     }
     if (isUsable(own)) {
         return load(own);
     }
-    if (perform(Effect::store, "certificate", [&] { return makeOwn(own); }) < 0) {
-        return std::nullopt;
+    if (const auto made = perform(Effect::store, "certificate", [&] { return makeOwn(own); }); !made) {
+        return made.error();
     }
     return isUsable(own) ? load(own) : throwAway();
 }

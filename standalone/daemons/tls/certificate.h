@@ -2,9 +2,10 @@
 #ifndef VELT_STANDALONE_DAEMONS_TLS_CERTIFICATE_H
 #define VELT_STANDALONE_DAEMONS_TLS_CERTIFICATE_H
 
+#include "base/result.h"
+
 #include <filesystem>
 #include <memory>
-#include <optional>
 #include <string>
 
 namespace velt {
@@ -22,10 +23,10 @@ struct ServerCertificate {
 
 /// The administrator's certificate ("/etc/velt/tls/server.crt" and ".key" below the state root) if given,
 /// else a self-signed one, made at the first call and again once it has run out. Where the thread's hook
-/// leaves the store of it undone, a throw-away one that is gone with the result. Nothing, with the last error
-/// set, when a file cannot be read or written, key and certificate do not belong together, or the kind of key
-/// is neither RSA nor an elliptic curve. Thread-safe.
-std::optional<ServerCertificate> serverCertificate();
+/// leaves the store of it undone, a throw-away one that is gone with the result. Fails when a file cannot be
+/// read or written, key and certificate do not belong together, or the kind of key is neither RSA nor an
+/// elliptic curve. Thread-safe.
+Result<ServerCertificate> serverCertificate();
 
 } // namespace velt
 

@@ -1,12 +1,14 @@
 #include "standalone/daemons/tls/self_signed.h"
 
 #include "base/ipv4.h"
+#include "standalone/core/error_number.h"
 #include "standalone/daemons/tls/openssl_owners.h"
 
 #include <arpa/inet.h>
 #include <ifaddrs.h>
 #include <netinet/in.h>
 #include <openssl/ec.h>
+#include <openssl/err.h>
 #include <openssl/pem.h>
 #include <openssl/rand.h>
 #include <unistd.h>
@@ -137,6 +139,11 @@ std::string contentsOf(BIO* bio) {
     return length > 0 ? std::string(data, static_cast<std::size_t>(length)) : std::string();
 }
 
+Error libraryError() {
+    ERR_clear_error();
+    return {ErrorNumber::daemon, "The OpenSSL library cannot make a certificate for this server."};
+}
+
 } // namespace
 
 CertificateNames namesOfThisHost() {
@@ -171,17 +178,17 @@ CertificateNames namesOfThisHost() {
     return names;
 }
 
-std::optional<SelfSigned> makeSelfSigned(const CertificateNames& names) {
+Result<SelfSigned> makeSelfSigned(const CertificateNames& names) {
     const KeyOwner key(EVP_EC_gen("P-256"));
     const CertificateOwner certificate(X509_new());
     if (!key || !certificate || !fill(certificate.get(), key.get(), names)) {
-        return std::nullopt;
+        return libraryError();
     }
     const BioOwner certificateText(BIO_new(BIO_s_mem()));
     const BioOwner keyText(BIO_new(BIO_s_secmem()));
     if (!certificateText || !keyText || PEM_write_bio_X509(certificateText.get(), certificate.get()) != 1 ||
         PEM_write_bio_PrivateKey(keyText.get(), key.get(), nullptr, nullptr, 0, nullptr, nullptr) != 1) {
-        return std::nullopt;
+        return libraryError();
     }
     return SelfSigned{contentsOf(certificateText.get()), contentsOf(keyText.get())};
 }

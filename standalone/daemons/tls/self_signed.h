@@ -2,7 +2,8 @@
 #ifndef VELT_STANDALONE_DAEMONS_TLS_SELF_SIGNED_H
 #define VELT_STANDALONE_DAEMONS_TLS_SELF_SIGNED_H
 
-#include <optional>
+#include "base/result.h"
+
 #include <string>
 #include <vector>
 
@@ -22,9 +23,8 @@ struct SelfSigned {
     std::string key;         ///< PEM, not encrypted
 };
 
-/// Makes a key (ECDSA P-256) and a certificate for it that is valid from now on for ten years. Nothing when
-/// the library fails.
-std::optional<SelfSigned> makeSelfSigned(const CertificateNames& names);
+/// Makes a key (ECDSA P-256) and a certificate for it that is valid from now on for ten years.
+Result<SelfSigned> makeSelfSigned(const CertificateNames& names);
 
 } // namespace velt
 

@@ -146,7 +146,7 @@ TEST_F(OpenApiTest, EveryOtherPathIsServedAsDescribed) {
     velt::LogEntry entry;
     entry.event = 0x11B00012;
     FakeStandalone::instance().log = {entry};
-    FakeStandalone::instance().down = {{"ftp", "No luck.", false}};
+    FakeStandalone::instance().down = {{"ftp", "No luck.", false, "FTP"}};
     for (const std::string& path : document["paths"].getMemberNames()) {
         if (path.find("/v") != std::string::npos || path == "/events") {
             continue;
@@ -203,7 +203,7 @@ TEST_F(OpenApiTest, AnAnswerWithAnotherVersionsKeyWouldBeNoticed) {
 
 TEST_F(OpenApiTest, ProblemsAreAsDescribed) {
     const Json::Value schema = resolved(document["components"]["schemas"]["Problem"]);
-    FakeStandalone::instance().down = {{"ftp", "No luck.", true}};
+    FakeStandalone::instance().down = {{"ftp", "No luck.", true, "FTP"}};
     EXPECT_EQ(violation(schema, post("/api/" + ftp + ".SFTP/v1/set", R"({"enable":true})").json()), "");
     EXPECT_EQ(violation(schema, get("/api/log?limit=x").json()), "");
     EXPECT_EQ(violation(schema, get("/nowhere").json()), "");

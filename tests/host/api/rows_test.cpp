@@ -110,7 +110,7 @@ TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
               "The FTP port is taken"},
              {ftp + "3/set", range.c_str(), 40000, 1904, "The passive port range is taken"},
              {sftp + "set", R"({"enable":true,"portnum":2222})", 2222, 1951, "The SFTP port is taken"}}) {
-        access.conflict = {each.port, "nginx (process 812)"};
+        access.conflict = {each.port, "nginx (process 812)", ""};
         const Answer answer = post(each.target, each.body);
         EXPECT_EQ(answer.status, 409);
         const Json::Value problem = answer.json();

@@ -10,7 +10,7 @@ namespace {
 const std::string ftp = "/api/VELT.Core.FileServ.FTP/v";
 const std::string chroot = "/api/VELT.Core.FileServ.FTP.ChrootUser/v";
 const std::string sftp = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
-const velt::ServiceDown ftpDown{"ftp", "The FTP daemon does not start: no luck.", false};
+const velt::ServiceDown ftpDown{"ftp", "The FTP daemon does not start: no luck.", false, "FTP"};
 
 class HostServices : public HostTest {
 protected:
@@ -64,7 +64,7 @@ TEST_F(HostServices, AChangeThatGetsTheServiceUpIsDone) {
 }
 
 TEST_F(HostServices, AServiceWithFormerSettingsIsNotDoneEither) {
-    access.down = {{"sftp", "The configuration was refused.", true}};
+    access.down = {{"sftp", "The configuration was refused.", true, "SFTP"}};
     const Answer answer = post(chroot + "1/add", R"({"id":["eve"]})");
     EXPECT_EQ(answer.status, 500);
     EXPECT_EQ(answer.json()["detail"], "The change is stored. The SFTP service runs with its former "
@@ -93,7 +93,7 @@ TEST_F(HostServices, StatusAndMetricsTellWhatIsSwitchedOnButDown) {
     platform.conf.service_flags = 1;
     platform.sftp.enable = 1;
     platform.sftpAlive = 0;
-    access.down = {ftpDown, {"sftp", "The SFTP daemon is paused.", false}};
+    access.down = {ftpDown, {"sftp", "The SFTP daemon is paused.", false, "SFTP"}};
     const Json::Value services = get("/api/status").json()["services"];
     EXPECT_EQ(services[0]["enabled"], true);
     EXPECT_EQ(services[0]["running"], false);
@@ -113,9 +113,9 @@ TEST_F(HostServices, StatusAndMetricsTellWhatIsSwitchedOnButDown) {
 }
 
 TEST_F(HostServices, SettingsThatCannotBeReadAreNotHidden) {
-    platform.fail("VELTFTPConfGet", 1); // of the stored switches
-    platform.fail("VELTFTPConfGet", 2); // of the module
-    access.down = {{"ftp", "The file ftp.conf, line 1, is damaged.", false}};
+    access.settingsFail = true;
+    platform.fail("VELTFTPConfGet", 1); // of the module
+    access.down = {{"ftp", "The file ftp.conf, line 1, is damaged.", false, "FTP"}};
     const Json::Value services = get("/api/status").json()["services"];
     ASSERT_EQ(services.size(), 3U);
     EXPECT_TRUE(services[0]["enabled"].isNull());
@@ -125,13 +125,13 @@ TEST_F(HostServices, SettingsThatCannotBeReadAreNotHidden) {
 }
 
 TEST_F(HostServices, RestartsOfCrashedDaemonsAreCounted) {
-    access.restarts = {{"ftpd", 2}, {"sftp", 0}};
+    access.restarts = {{"ftp", 2}, {"sftp", 0}};
     EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 2)"));
     EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="sftp"} 0)"));
-    access.restarts["ftpd"] = 3;
+    access.restarts["ftp"] = 3;
     EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 3)"));
     EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 3)")) << "none is counted twice";
-    access.restarts["ftpd"] = 1;
+    access.restarts["ftp"] = 1;
     EXPECT_TRUE(measured(R"(velt_daemon_restarts_total{daemon="ftp"} 4)"))
         << "counted anew, by a new supervisor";
 }

@@ -1,8 +1,8 @@
 #include "tests/standalone/control/plan_double.h"
 
-#include "standalone/core/last_error.h"
-#include "standalone/daemons/candidate.h"
-#include "standalone/daemons/daemon_plan.h"
+#include "standalone/core/error_number.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/settings/settings.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
@@ -15,20 +15,23 @@ PlanDouble& planDouble() {
 
 namespace {
 
-int refuseIfAsked() {
-    return planDouble().refuse ? fail(ErrorNumber::daemon, "The configuration was refused.") : 0;
+Result<> refuseIfAsked() {
+    if (planDouble().refuse) {
+        return Error(ErrorNumber::daemon, "The configuration was refused.");
+    }
+    return {};
 }
 
-std::optional<DaemonPlan> makePlan(int port, const std::string& settings,
-                                   const std::vector<std::string>& options) {
-    if (refuseIfAsked() < 0) {
-        return std::nullopt;
+Result<std::optional<DaemonPlan>> makePlan(int port, const std::string& settings,
+                                           const std::vector<std::string>& options) {
+    if (const auto refused = refuseIfAsked(); !refused) {
+        return refused.error();
     }
     std::string hash = settings;
     for (const std::string& option : options) {
         hash += " " + option;
     }
-    return testPlan(port, hash, options);
+    return std::optional(DaemonPlan{testOrder(port, hash, options), {}});
 }
 
 } // namespace
@@ -36,30 +39,34 @@ std::optional<DaemonPlan> makePlan(int port, const std::string& settings,
 
 namespace velt {
 
-std::optional<DaemonPlan> planFtpDaemon() {
-    const auto settings = orLastError(loadFtpSettings());
+Result<std::optional<DaemonPlan>> planFtpDaemon() {
+    const auto settings = loadFtpSettings();
     if (!settings) {
-        return std::nullopt;
+        return settings.error();
     }
     const auto& record = settings->record;
+    if (!enablesFtp(record)) {
+        return std::optional<DaemonPlan>();
+    }
     return test::makePlan(controlPort(record),
                           std::string(record.portnum) + " " + std::to_string(record.service_flags) + " " +
                               std::to_string(record.maxuploadrate),
                           test::planDouble().ftpOptions);
 }
 
-std::optional<DaemonPlan> planSftpDaemon() {
-    const auto settings = orLastError(loadSftpSettings());
-    return settings ? test::makePlan(settings->port, std::to_string(settings->port),
-                                     test::planDouble().sftpOptions)
-                    : std::nullopt;
+Result<std::optional<DaemonPlan>> planSftpDaemon() {
+    const auto settings = loadSftpSettings();
+    if (!settings) {
+        return settings.error();
+    }
+    return test::makePlan(settings->port, std::to_string(settings->port), test::planDouble().sftpOptions);
 }
 
-int testFtpCandidate(const FtpSettings&) {
+Result<> testFtpCandidate(const FtpSettings&) {
     return test::refuseIfAsked();
 }
 
-int testSftpCandidate(const SftpSettings&) {
+Result<> testSftpCandidate(const SftpSettings&) {
     return test::refuseIfAsked();
 }
 

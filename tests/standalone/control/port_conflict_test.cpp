@@ -5,12 +5,12 @@
 #include "platform/service.h"
 #include "platform/sftp.h"
 #include "platform/webapi.h"
-#include "standalone/control/services.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/control/plan_double.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/standalone/support/daemon_states.h"
 
 #include <unistd.h>
 

@@ -17,7 +17,7 @@ protected:
     void SetUp() override {
         ServicesTest::SetUp();
         storeSftp(true);
-        ASSERT_EQ(startEnabledServices(), 0) << lastErrorSentence();
+        ASSERT_EQ(messageOf(startEnabledServices()), "");
     }
 
     void TearDown() override {
@@ -31,17 +31,17 @@ protected:
     }
 
     /// Whether the service serves under a supervisor, and both are others than these.
-    static bool isRestored(const std::string& service, const ServiceState& former) {
-        const ServiceState now = serviceState(service);
+    static bool isRestored(const std::string& service, const DaemonState& former) {
+        const DaemonState now = serviceState(service);
         return isServing(now) && isAlive(now.supervisor) && !(now.supervisor == former.supervisor) &&
                !(now.daemon == former.daemon);
     }
 };
 
 TEST_F(ServiceWatchTest, AKilledSupervisorIsReplacedWithinTwoSeconds) {
-    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(watchServices()), "");
     for (const char* service : {"ftpd", "sftp"}) {
-        const ServiceState former = serviceState(service);
+        const DaemonState former = serviceState(service);
         kill(former.supervisor);
         EXPECT_TRUE(waitUntil([&] { return isRestored(service, former); }, seconds(2))) << service;
         EXPECT_FALSE(isAlive(former.daemon)) << "no daemon of ours without a supervisor";
@@ -53,8 +53,8 @@ TEST_F(ServiceWatchTest, AKilledSupervisorIsReplacedWithinTwoSeconds) {
 }
 
 TEST_F(ServiceWatchTest, ADaemonThatDiesWithItsSupervisorIsUpAgainWithinTwoSeconds) {
-    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
-    const ServiceState former = serviceState("ftpd");
+    ASSERT_EQ(messageOf(watchServices()), "");
+    const DaemonState former = serviceState("ftpd");
     signalProcess(former.supervisor, SIGKILL);
     signalProcess(former.daemon, SIGKILL);
     EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(2)));
@@ -62,32 +62,32 @@ TEST_F(ServiceWatchTest, ADaemonThatDiesWithItsSupervisorIsUpAgainWithinTwoSecon
 }
 
 TEST_F(ServiceWatchTest, TheNewDaemonTakesTheStoredSettings) {
-    const ServiceState former = serviceState("ftpd");
+    const DaemonState former = serviceState("ftpd");
     const int formerPort = ftpPort_;
     ftpPort_ = freePort();
     storeFtp(plain);
     kill(former.supervisor);
-    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(watchServices()), "");
     EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(2)));
     EXPECT_TRUE(accepts(ftpPort_));
     EXPECT_FALSE(accepts(formerPort));
 }
 
 TEST_F(ServiceWatchTest, WhatIsSwitchedOffByNowIsEnded) {
-    const ServiceState former = serviceState("sftp");
+    const DaemonState former = serviceState("sftp");
     storeSftp(false);
     kill(former.supervisor);
-    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(watchServices()), "");
     EXPECT_TRUE(waitUntil([&] { return !isAlive(former.daemon); }, seconds(2)));
     EXPECT_TRUE(waitUntil([] { return serviceState("sftp").state == RunState::stopped; }, milliseconds(500)));
 }
 
 TEST_F(ServiceWatchTest, AFailedStartIsTriedAgain) {
-    const ServiceState former = serviceState("ftpd");
+    const DaemonState former = serviceState("ftpd");
     kill(former.supervisor);
     kill(former.daemon);
     std::optional<Listener> other(ftpPort_);
-    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(watchServices()), "");
     EXPECT_TRUE(waitUntil([] { return servicesDown().size() == 1; }, seconds(2)));
     EXPECT_TRUE(waitUntil(
         [] {
@@ -100,7 +100,7 @@ TEST_F(ServiceWatchTest, AFailedStartIsTriedAgain) {
 }
 
 TEST_F(ServiceWatchTest, WhatWasStoppedPausedOrRefusedIsLeftAlone) {
-    ASSERT_EQ(watchServices(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(watchServices()), "");
     ASSERT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
     ASSERT_EQ(VLIBServicePause("sftp"), 0) << lastErrorSentence();
     kill(serviceState("sftp").supervisor);
@@ -112,23 +112,23 @@ TEST_F(ServiceWatchTest, WhatWasStoppedPausedOrRefusedIsLeftAlone) {
     planDouble().ftpOptions = {"--refuse", "not today"};
     EXPECT_LT(VLIBServicectlStart("ftpd", 0), 0);
     planDouble().ftpOptions = {};
-    ASSERT_EQ(watchServices(), 0);
+    ASSERT_EQ(messageOf(watchServices()), "");
     std::this_thread::sleep_for(milliseconds(1200));
     EXPECT_FALSE(accepts(ftpPort_)) << "whoever asked for the start has heard of its failure";
 }
 
 TEST_F(ServiceWatchTest, EndsAtOnceAndCanBeTakenUpAgain) {
-    ASSERT_EQ(watchServices(), 0);
-    ASSERT_EQ(watchServices(), 0) << "a second call is no second watch";
+    ASSERT_EQ(messageOf(watchServices()), "");
+    ASSERT_EQ(messageOf(watchServices()), "") << "a second call is no second watch";
     const auto began = std::chrono::steady_clock::now();
     unwatchServices();
     unwatchServices();
     EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(400));
-    const ServiceState former = serviceState("ftpd");
+    const DaemonState former = serviceState("ftpd");
     kill(former.supervisor);
     std::this_thread::sleep_for(milliseconds(800));
     EXPECT_TRUE(isAlive(former.daemon)) << "nobody watches";
-    ASSERT_EQ(watchServices(), 0);
+    ASSERT_EQ(messageOf(watchServices()), "");
     EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(2)));
 }
 

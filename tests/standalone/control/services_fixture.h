@@ -6,12 +6,13 @@
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
-#include "standalone/control/services.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/control/plan_double.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/standalone/support/daemon_states.h"
+#include "tests/support/result.h"
 
 #include <cstdio>
 #include <string>

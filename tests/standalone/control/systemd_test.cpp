@@ -2,7 +2,7 @@
 // stand-in, which starts and ends real supervisors.
 
 #include "base/file.h"
-#include "standalone/control/supervise_backend.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/control/systemd_launcher.h"
 #include "standalone/control/systemd_unit.h"
 #include "standalone/core/installed_files.h"
@@ -10,6 +10,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/process/run_program.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/result.h"
 
 #include <csignal>
 #include <fstream>
@@ -29,12 +30,12 @@ protected:
         places_.systemctl = (root_ / "systemctl").string();
         places_.units = root_ / "units";
         answerWith(systemctlScript());
-        backend_ =
-            std::make_unique<SuperviseBackend>("sftp", std::make_unique<SystemdLauncher>("sftp", places_));
+        sftp_ = std::make_unique<SupervisedDaemon>(sftpDaemon,
+                                                   std::make_unique<SystemdLauncher>(sftpDaemon, places_));
     }
 
     void TearDown() override {
-        EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+        EXPECT_EQ(messageOf(sftp_->stop()), "");
         DaemonTest::TearDown();
     }
 
@@ -68,23 +69,21 @@ esac
     std::string calls() const { return readFile(root_ / "calls").valueOr(""); }
     void forgetCalls() const { std::filesystem::remove(root_ / "calls"); }
 
-    void start(const std::string& hash) {
-        ASSERT_EQ(backend_->start(testPlan(port_, hash)), 0) << lastErrorSentence();
-    }
+    void start(const std::string& hash) { ASSERT_EQ(messageOf(sftp_->start(testOrder(port_, hash))), ""); }
 
     void killSupervisor() {
-        const ProcessId supervisor = backend_->state().supervisor;
+        const ProcessId supervisor = daemonState(sftpDaemon).supervisor;
         signalProcess(supervisor, SIGKILL);
         ASSERT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, seconds(1)));
     }
 
     int port_ = freePort();
     SystemdPlaces places_;
-    std::unique_ptr<SuperviseBackend> backend_;
+    std::unique_ptr<SupervisedDaemon> sftp_;
 };
 
 TEST_F(SystemdTest, TheUnitRunsTheSupervisor) {
-    EXPECT_EQ(renderUnit("sftp", "/run/velt"), R"([Unit]
+    EXPECT_EQ(renderUnit(sftpDaemon, "/run/velt"), R"([Unit]
 Description=VELT SFTP server
 After=network.target
 StartLimitIntervalSec=0
@@ -92,7 +91,7 @@ StartLimitIntervalSec=0
 [Service]
 Type=notify
 ExecStart=")" + installedFile("velt-supervise").string() +
-                                                   R"(" "/run/velt" "sftp"
+                                                       R"(" "/run/velt" "sftp"
 Restart=on-abnormal
 RestartSec=100ms
 KillMode=process
@@ -100,7 +99,7 @@ TimeoutStartSec=10s
 TimeoutStopSec=5s
 OOMPolicy=continue
 )");
-    EXPECT_EQ(unitName("ftpd"), "velt-ftpd.service");
+    EXPECT_EQ(unitName(ftpDaemon), "velt-ftpd.service");
 }
 
 TEST(SystemdUnit, QuotesWhatHasAMeaningOfItsOwn) {
@@ -115,15 +114,15 @@ TEST(SystemdUnit, QuotesWhatHasAMeaningOfItsOwn) {
 TEST_F(SystemdTest, AStartWritesTheUnitAndReturnsWhenTheDaemonListens) {
     start("one");
     EXPECT_TRUE(accepts(port_));
-    EXPECT_EQ(readFile(places_.units / "velt-sftp.service"), renderUnit("sftp", statePath("/run/velt")));
-    EXPECT_TRUE(isServing(backend_->state()));
+    EXPECT_EQ(readFile(places_.units / "velt-sftp.service"), renderUnit(sftpDaemon, statePath("/run/velt")));
+    EXPECT_TRUE(isServing(daemonState(sftpDaemon)));
     EXPECT_EQ(calls(), "daemon-reload\nrestart velt-sftp.service\n");
     forgetCalls();
     start("one");
     EXPECT_EQ(calls(), "") << "nothing changed";
-    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(sftp_->stop()), "");
     EXPECT_EQ(calls(), "stop velt-sftp.service\nreset-failed velt-sftp.service\n");
-    EXPECT_EQ(backend_->state().state, RunState::stopped);
+    EXPECT_EQ(daemonState(sftpDaemon).state, RunState::stopped);
     forgetCalls();
     start("two");
     EXPECT_EQ(calls(), "restart velt-sftp.service\n") << "the unit is as it was";
@@ -133,9 +132,9 @@ TEST_F(SystemdTest, TheStockServersStopLeavesTheFolderThatEachConnectionNeeds) {
     start("one");
     EXPECT_EQ(readFile(places_.units / "ssh.service.d/velt-sftp.conf"),
               "[Service]\nRuntimeDirectoryPreserve=yes\n");
-    SuperviseBackend ftp("ftpd", std::make_unique<SystemdLauncher>("ftpd", places_));
+    SupervisedDaemon ftp(ftpDaemon, std::make_unique<SystemdLauncher>(ftpDaemon, places_));
     std::filesystem::remove_all(places_.units / "ssh.service.d");
-    EXPECT_LT(ftp.start(testPlan(freePort(), "one", {"--refuse", "no"})), 0);
+    EXPECT_FALSE(ftp.start(testOrder(freePort(), "one", {"--refuse", "no"})));
     EXPECT_FALSE(std::filesystem::exists(places_.units / "ssh.service.d")) << "FTP does not need it";
 }
 
@@ -143,10 +142,10 @@ TEST_F(SystemdTest, SessionsThatWereMovedOutOfTheUnitOutliveAPauseAndEndWithASto
     start("one");
     Client client(port_); // no control group tells whose session this is
     ASSERT_TRUE(client.isServed());
-    ASSERT_EQ(backend_->pause(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(sftp_->pause()), "");
     EXPECT_FALSE(accepts(port_));
     EXPECT_TRUE(client.isServed());
-    ASSERT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(sftp_->stop()), "");
     EXPECT_FALSE(client.isServed());
 }
 
@@ -159,51 +158,52 @@ TEST_F(SystemdTest, AKilledSupervisorComesBackWithTheSettingsThatWereTakenUpLast
     ASSERT_EQ(runProcess({places_.systemctl, "restart", "velt-sftp.service"}).exitCode, 0);
     EXPECT_TRUE(accepts(port_));
     EXPECT_FALSE(accepts(former));
-    EXPECT_EQ(backend_->state().configurationHash, "two");
+    EXPECT_EQ(daemonState(sftpDaemon).configurationHash, "two");
 }
 
 TEST_F(SystemdTest, AStopOfAKilledSupervisorIsToldToSystemd) {
     start("one");
     killSupervisor();
     forgetCalls();
-    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(sftp_->stop()), "");
     EXPECT_TRUE(calls().starts_with("stop velt-sftp.service\n")) << "or the daemon would come back";
     EXPECT_FALSE(accepts(port_));
 }
 
 TEST_F(SystemdTest, AFailedStartGivesTheDaemonsWords) {
-    EXPECT_LT(backend_->start(testPlan(port_, "one", {"--refuse", "fatal: no such certificate"})), 0);
-    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: fatal: no such certificate.");
+    const std::string refusal =
+        messageOf(sftp_->start(testOrder(port_, "one", {"--refuse", "fatal: no such certificate"})));
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: fatal: no such certificate.");
 }
 
 TEST_F(SystemdTest, SystemdsOwnRefusalIsNamed) {
     answerWith("[ $1 = restart ] || exit 0\necho 'Failed to restart: Unit is masked.' >&2; exit 1\n");
-    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
-    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: Failed to restart: Unit is masked.");
+    std::string refusal = messageOf(sftp_->start(testOrder(port_, "one")));
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: Failed to restart: Unit is masked.");
     answerWith("[ $1 = daemon-reload ] && exit 3\nexit 0\n");
     std::filesystem::remove(places_.units / "velt-sftp.service");
-    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
-    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: systemctl ended with status 3.");
+    refusal = messageOf(sftp_->start(testOrder(port_, "one")));
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: systemctl ended with status 3.");
 }
 
 TEST_F(SystemdTest, AnAnswerIsNotTakenForADaemon) {
     answerWith("exit 0\n"); // as in a changed root, where systemctl ignores all requests
-    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
-    EXPECT_EQ(lastErrorSentence(),
+    const std::string refusal = messageOf(sftp_->start(testOrder(port_, "one")));
+    EXPECT_EQ(refusal,
               "The SFTP daemon does not start: systemd says that it has started it, but it does not serve.");
 }
 
 TEST_F(SystemdTest, AStartIsOverWithinFiveSeconds) {
     answerWith("[ $1 = restart ] && exec sleep 20\nexit 0\n");
     const auto began = std::chrono::steady_clock::now();
-    EXPECT_LT(backend_->start(testPlan(port_, "one")), 0);
+    const std::string refusal = messageOf(sftp_->start(testOrder(port_, "one")));
     EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(5500));
-    EXPECT_EQ(lastErrorSentence(), "The SFTP daemon does not start: its supervisor does not report in time.");
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor does not report in time.");
 }
 
 TEST_F(SystemdTest, WhatWasNeverStartedIsStoppedWithoutACall) {
-    EXPECT_EQ(backend_->stop(), 0) << lastErrorSentence();
-    EXPECT_EQ(backend_->pause(), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(sftp_->stop()), "");
+    EXPECT_EQ(messageOf(sftp_->pause()), "");
     EXPECT_EQ(calls(), "");
 }
 

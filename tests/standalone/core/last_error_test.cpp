@@ -53,15 +53,5 @@ TEST(LastError, ANamedPlaceIsReportedWithoutItsFolder) {
     EXPECT_EQ(VLIBCErrorGetLine(), 7);
 }
 
-TEST(LastError, IsPutBackAfterWorkOfAnotherOperation) {
-    fail(ErrorNumber::daemon, "The first.");
-    {
-        const LastErrorKept kept;
-        fail(ErrorNumber::store, "The second.");
-    }
-    EXPECT_EQ(lastErrorSentence(), "The first.");
-    EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::daemon));
-}
-
 } // namespace
 } // namespace velt

@@ -9,6 +9,7 @@
 #include "standalone/accounts/account_sources.h"
 #include "standalone/contract/string_map.h"
 #include "standalone/control/start_failure.h"
+#include "standalone/core/boundary.h"
 #include "standalone/core/last_error.h"
 #include "standalone/journal/event_file.h"
 #include "standalone/settings/settings.h"
@@ -218,10 +219,10 @@ const Store stores[] = {
      [] { return VLIBServicecfgRunKeySet("ftpd", 2); }, [] { return fileText("/etc/velt/run-keys/ftpd"); }},
     {"Shares", [] { return storeShares("/srv/old"); }, [] { return storeShares("/srv/new"); }, readShares},
     {"TheLog", logAnew, [] { return logText("new"); }, readLog},
-    {"TheFailureOfAStart", [] { return noteOutcome("ftpd", 0); },
+    {"TheFailureOfAStart", [] { return toContract(noteOutcome(ftpDaemon, {})); },
      [] {
-         fail(ErrorNumber::daemon, "It does not start.");
-         return noteOutcome("ftpd", -1) + 1;
+         const Error failure(ErrorNumber::daemon, "It does not start.");
+         return noteOutcome(ftpDaemon, failure) ? -1 : 0;
      },
      [] { return fileText("/run/velt/ftpd.failure"); }},
     {"AnEvent", emitAnew, [] { return emit("new"); }, readEvents},
@@ -284,7 +285,7 @@ protected:
 };
 
 TEST_F(FirstStartCrash, LeavesNoSettingsOrWholeDefaults) {
-    const auto openHere = [this] { return openState(root_.path()); };
+    const auto openHere = [this] { return toContract(openState(root_.path())); };
     const auto readBoth = [] { return readRecord() + readSftp(); };
     const std::string defaults = tellInChild(readBoth);
     int call = 0;

@@ -7,8 +7,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-
 namespace velt {
 namespace {
 
@@ -73,22 +71,6 @@ std::string describe(const Ranges& ranges) {
         text += std::to_string(range.first) + "-" + std::to_string(range.last) + " ";
     }
     return text;
-}
-
-TEST(FirewallPorts, AreThoseOfTheEnabledServices) {
-    FtpSettings ftp;
-    std::snprintf(ftp.record.portnum, sizeof ftp.record.portnum, "2121");
-    SftpSettings sftp{false, 2222};
-    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "");
-    ftp.record.service_flags = VELT_FTP_SERVICE_TLS;
-    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2121-2121 55536-55899 ");
-    ftp.record.passive_port_min = 40000;
-    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2121-2121 55536-55899 ") << "half a range is none";
-    ftp.record.passive_port_max = 40100;
-    sftp.enabled = true;
-    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2121-2121 40000-40100 2222-2222 ");
-    ftp.record.service_flags = 4;
-    EXPECT_EQ(describe(servicePorts(ftp, sftp)), "2222-2222 ");
 }
 
 class FirewallSettingsFile : public testing::Test {

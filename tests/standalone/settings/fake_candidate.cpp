@@ -1,16 +1,17 @@
 #include "tests/standalone/settings/fake_candidate.h"
 
-#include "standalone/core/last_error.h"
-#include "standalone/daemons/candidate.h"
+#include "standalone/core/error_number.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
 
 namespace velt {
 
 namespace {
 
-int answer() {
+Result<> answer() {
     if (!test::fakeCandidate().refuses)
-        return 0;
-    return fail(ErrorNumber::daemon, "The daemon does not take it.");
+        return {};
+    return Error(ErrorNumber::daemon, "The daemon does not take it.");
 }
 
 } // namespace
@@ -20,12 +21,12 @@ test::FakeCandidate& test::fakeCandidate() {
     return candidate;
 }
 
-int testFtpCandidate(const FtpSettings& settings) {
+Result<> testFtpCandidate(const FtpSettings& settings) {
     test::fakeCandidate().ftp.push_back(settings);
     return answer();
 }
 
-int testSftpCandidate(const SftpSettings& settings) {
+Result<> testSftpCandidate(const SftpSettings& settings) {
     test::fakeCandidate().sftp.push_back(settings);
     return answer();
 }

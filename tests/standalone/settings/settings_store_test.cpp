@@ -3,16 +3,19 @@
 #include "standalone/settings/settings_files.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/settings/settings_fixture.h"
+#include "tests/support/result.h"
 
 #include <sys/stat.h>
 
 namespace velt {
 namespace {
 
+using test::messageOf;
+
 class SettingsStore : public test::SettingsTest {};
 
 TEST_F(SettingsStore, TheFirstOpeningWritesTheDefaults) {
-    ASSERT_EQ(openState(root_.path()), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), formatSettings(ftpSettingsFile(), defaultFtpSettings()));
     EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSettings(sftpSettingsFile(), defaultSftpSettings()));
     struct stat status {};
@@ -22,15 +25,15 @@ TEST_F(SettingsStore, TheFirstOpeningWritesTheDefaults) {
 
 TEST_F(SettingsStore, ALaterOpeningLeavesWhatIsThere) {
     root_.write("etc/velt/ftp.conf", "damaged");
-    ASSERT_EQ(openState(root_.path()), 0);
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), "damaged");
     EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSettings(sftpSettingsFile(), defaultSftpSettings()));
 }
 
 TEST_F(SettingsStore, AnOpeningThatCannotWriteSaysWhy) {
     root_.write("etc", "a file where a folder should be");
-    EXPECT_LT(openState(root_.path()), 0);
-    EXPECT_EQ(lastErrorSentence(), "Cannot make the folder " + place("/etc/velt") + ": Not a directory.");
+    EXPECT_EQ(messageOf(openState(root_.path())),
+              "Cannot make the folder " + place("/etc/velt") + ": Not a directory.");
 }
 
 TEST_F(SettingsStore, TheExternalAddressComesFromTheSystemInformation) {

@@ -97,14 +97,10 @@ Listener::~Listener() {
     ::close(descriptor_);
 }
 
-DaemonPlan testPlan(int port, const std::string& hash, const std::vector<std::string>& options) {
-    DaemonPlan plan;
-    plan.executable = VELT_TEST_DAEMON;
-    plan.arguments = {VELT_TEST_DAEMON, "--port", std::to_string(port)};
-    plan.arguments.insert(plan.arguments.end(), options.begin(), options.end());
-    plan.configurationHash = hash;
-    plan.listenPorts = {port};
-    return plan;
+DaemonOrder testOrder(int port, const std::string& hash, const std::vector<std::string>& options) {
+    DaemonOrder order{hash, {port}, {VELT_TEST_DAEMON, "--port", std::to_string(port)}};
+    order.arguments.insert(order.arguments.end(), options.begin(), options.end());
+    return order;
 }
 
 void DaemonTest::SetUp() {

@@ -2,8 +2,8 @@
 #ifndef VELT_TESTS_STANDALONE_SUPERVISE_DAEMON_TEST_H
 #define VELT_TESTS_STANDALONE_SUPERVISE_DAEMON_TEST_H
 
-#include "standalone/daemons/daemon_plan.h"
 #include "standalone/process/process_identity.h"
+#include "standalone/supervise/daemon_order.h"
 
 #include <gtest/gtest.h>
 
@@ -50,8 +50,8 @@ private:
     int descriptor_ = -1;
 };
 
-/// The plan that starts the test daemon on this port.
-DaemonPlan testPlan(int port, const std::string& hash, const std::vector<std::string>& options = {});
+/// What starts the test daemon on this port.
+DaemonOrder testOrder(int port, const std::string& hash, const std::vector<std::string>& options = {});
 
 /// A state root of the test's own, and the promise that no process outlives the test: whatever detached
 /// itself is inherited, and its being there is a failure.

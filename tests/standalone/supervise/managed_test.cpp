@@ -5,8 +5,9 @@
 #include "standalone/core/installed_files.h"
 #include "standalone/core/state_root.h"
 #include "standalone/supervise/control_channel.h"
-#include "standalone/supervise/service_state.h"
+#include "standalone/supervise/daemon_state.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/result.h"
 
 #include <spawn.h>
 #include <sys/socket.h>
@@ -53,9 +54,7 @@ protected:
     }
 
     void order(const std::vector<std::string>& options = {}) const {
-        const DaemonPlan plan = testPlan(port_, "one", options);
-        const ControlRequest request{Command::start,
-                                     {plan.configurationHash, plan.listenPorts, plan.arguments}};
+        const ControlRequest request{Command::start, testOrder(port_, "one", options)};
         ASSERT_TRUE(replaceFile(orderFile(directory_, "sftp"), encodeRequest(request), 0600));
     }
 
@@ -101,10 +100,12 @@ TEST_F(ManagedSupervisor, StaysInTheForegroundAndSaysWhenTheDaemonServes) {
     EXPECT_EQ(heard(), "STATUS=the daemon serves");
     EXPECT_EQ(heard(), "READY=1");
     EXPECT_TRUE(accepts(port_));
-    EXPECT_EQ(readServiceState(stateFile(directory_, "sftp"))->supervisor.pid, supervisor);
+    EXPECT_EQ(readDaemonState(stateFile(directory_, "sftp"))->supervisor.pid, supervisor);
 
-    ASSERT_EQ(askSupervisor(directory_, "sftp", {Command::pause, {}}, seconds(5)), "");
-    EXPECT_EQ(heard(), "STATUS=paused, only sessions of before go on");
+    const auto answer = askSupervisor(directory_, "sftp", {Command::pause, {}}, seconds(5));
+    ASSERT_TRUE(answer);
+    ASSERT_EQ(messageOf(*answer), "");
+    EXPECT_EQ(heard(), "STATUS=paused: only the sessions that were open go on");
     ::kill(supervisor, SIGTERM);
     EXPECT_EQ(exitCodeOf(supervisor), 0);
     EXPECT_FALSE(std::filesystem::exists(stateFile(directory_, "sftp")));

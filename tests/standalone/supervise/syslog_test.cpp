@@ -1,6 +1,6 @@
 // Under which names the daemons' words are found in the system's log.
 #include "base/unique_fd.h"
-#include "standalone/control/supervise_backend.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/core/last_error.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
@@ -62,9 +62,9 @@ private:
 
 class SyslogTest : public DaemonTest {
 protected:
-    /// The line with `sign` that the supervisor of this service writes when its daemon says the words; found
+    /// The line with `sign` that the supervisor of this daemon writes when it says the words; found
     /// in a child, whose "/dev" goes with it.
-    std::string lineOf(const std::string& service, const std::string& words, const std::string& sign) const {
+    std::string lineOf(const Daemon& daemon, const std::string& words, const std::string& sign) const {
         const std::filesystem::path told = root_ / "line";
         const pid_t child = ::fork();
         if (child == 0) {
@@ -72,8 +72,8 @@ protected:
             if (!log.isThere()) {
                 ::_exit(77);
             }
-            SuperviseBackend backend(service);
-            backend.start(testPlan(freePort(), "one", {"--refuse", words}));
+            SupervisedDaemon supervised(daemon);
+            (void)supervised.start(testOrder(freePort(), "one", {"--refuse", words}));
             std::ofstream(told) << log.lineWith(sign);
             ::_exit(0);
         }
@@ -89,9 +89,9 @@ protected:
 };
 
 TEST_F(SyslogTest, ADaemonsWordsAreUnderItsName) {
-    for (const auto& [service, name] :
-         {std::pair("ftpd", " velt-ftpd["), std::pair("sftp", " velt-sftpd[")}) {
-        const std::string line = lineOf(service, "no such certificate", "certificate");
+    for (const auto& [daemon, name] :
+         {std::pair(&ftpDaemon, " velt-ftpd["), std::pair(&sftpDaemon, " velt-sftpd[")}) {
+        const std::string line = lineOf(*daemon, "no such certificate", "certificate");
         if (line == "skip") {
             GTEST_SKIP() << "no mount name space can be made here";
         }
@@ -102,7 +102,7 @@ TEST_F(SyslogTest, ADaemonsWordsAreUnderItsName) {
 }
 
 TEST_F(SyslogTest, NoWordForgesALineOrAFormat) {
-    const std::string line = lineOf("ftpd", "50%n \x1b[2J\rvelt-ftpd[1]: forged", "50%");
+    const std::string line = lineOf(ftpDaemon, "50%n \x1b[2J\rvelt-ftpd[1]: forged", "50%");
     if (line == "skip") {
         GTEST_SKIP() << "no mount name space can be made here";
     }

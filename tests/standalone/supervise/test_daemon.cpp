@@ -1,6 +1,8 @@
 // A daemon that behaves as its arguments say: what the supervisor is tried on.
 //
-//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--live MS] [--stubborn] [--any]
+//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--end-if FILE] [--stubborn] [--any]
+//
+// It ends by itself when there is a FILE, before or after it listens.
 //
 // It listens on loopback, with --any on all addresses; each connection is served by a session in a process
 // and a terminal session of its own, which answers every byte with the same byte and ends with its
@@ -24,7 +26,7 @@ namespace {
 struct Options {
     std::vector<int> ports;
     int delay = 0;
-    int live = 0;
+    const char* endFile = nullptr;
     const char* words = nullptr;
     bool stubborn = false;
     bool any = false;
@@ -51,8 +53,8 @@ Options parse(int argc, char** argv) {
             options.ports.push_back(number(value));
         } else if (name == "--delay") {
             options.delay = number(value);
-        } else if (name == "--live") {
-            options.live = number(value);
+        } else if (name == "--end-if") {
+            options.endFile = value;
         } else if (name == "--refuse") {
             options.words = value;
         }
@@ -74,6 +76,13 @@ int listenOn(int port, bool any) {
         std::exit(1);
     }
     return descriptor;
+}
+
+void endIfThere(const char* file) {
+    if (::access(file, F_OK) == 0) {
+        std::fprintf(stderr, "velt-test-daemon: told to end\n");
+        ::_exit(7);
+    }
 }
 
 [[noreturn]] void serveSession(int connection) {
@@ -98,16 +107,17 @@ int main(int argc, char** argv) {
     }
     ::signal(SIGCHLD, SIG_IGN);
     std::this_thread::sleep_for(std::chrono::milliseconds(options.delay));
+    if (options.endFile != nullptr) {
+        endIfThere(options.endFile);
+        std::thread([file = options.endFile] {
+            for (;; std::this_thread::sleep_for(std::chrono::milliseconds(5))) {
+                endIfThere(file);
+            }
+        }).detach();
+    }
     std::vector<int> listeners;
     for (const int port : options.ports) {
         listeners.push_back(listenOn(port, options.any));
-    }
-    if (options.live > 0) {
-        std::thread([live = options.live] {
-            std::this_thread::sleep_for(std::chrono::milliseconds(live));
-            std::fprintf(stderr, "velt-test-daemon: lived long enough\n");
-            ::_exit(7);
-        }).detach();
     }
     while (listeners.empty()) {
         ::pause();

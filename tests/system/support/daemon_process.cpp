@@ -21,9 +21,9 @@ namespace {
 
 constexpr const char* outputFile = "/mnt/daemon.output";
 
-pid_t spawn(const DaemonPlan& plan) {
+pid_t spawn(const DaemonOrder& order) {
     std::vector<char*> arguments;
-    for (const auto& argument : plan.arguments) {
+    for (const auto& argument : order.arguments) {
         arguments.push_back(const_cast<char*>(argument.c_str()));
     }
     arguments.push_back(nullptr);
@@ -59,11 +59,11 @@ bool isListening(int port) {
     return false;
 }
 
-bool DaemonProcess::start(const DaemonPlan& plan) {
-    pid_ = spawn(plan);
+bool DaemonProcess::start(const DaemonOrder& order) {
+    pid_ = spawn(order);
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(5);
     while (pid_ > 0 && std::chrono::steady_clock::now() < deadline) {
-        if (std::ranges::all_of(plan.listenPorts, isListening)) {
+        if (std::ranges::all_of(order.ports, isListening)) {
             return true;
         }
         if (waitpid(pid_, nullptr, WNOHANG) == pid_) {

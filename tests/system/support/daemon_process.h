@@ -2,7 +2,7 @@
 #ifndef VELT_TESTS_SYSTEM_SUPPORT_DAEMON_PROCESS_H
 #define VELT_TESTS_SYSTEM_SUPPORT_DAEMON_PROCESS_H
 
-#include "standalone/daemons/daemon_plan.h"
+#include "standalone/supervise/daemon_order.h"
 
 #include <sys/types.h>
 
@@ -17,7 +17,7 @@ public:
 
     /// Starts the daemon and waits until it listens; false, with the daemon's own output shown, when it does
     /// not.
-    bool start(const DaemonPlan& plan);
+    bool start(const DaemonOrder& order);
 
     /// Ends the daemon and waits for its end.
     void stop();

@@ -2,6 +2,7 @@
 
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "tests/support/result.h"
 
 #include <sys/stat.h>
@@ -53,8 +54,9 @@ void FtpService::start() {
     daemon_.stop();
     ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
     const auto plan = planFtpDaemon();
-    ASSERT_TRUE(plan) << lastErrorSentence();
-    ASSERT_TRUE(daemon_.start(*plan));
+    ASSERT_EQ(messageOf(plan), "");
+    ASSERT_TRUE(*plan);
+    ASSERT_TRUE(daemon_.start((*plan)->order));
 }
 
 void FtpService::storeRules(const std::vector<std::string>& rules) {

@@ -1,5 +1,6 @@
 #include "tests/system/support/module_service.h"
 
+#include "tests/support/result.h"
 #include "tests/system/support/leftovers.h"
 
 #include <json/reader.h>
@@ -35,7 +36,7 @@ void ModuleService::SetUp() {
         GTEST_SKIP() << whyNoWorld();
     }
     setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
-    ASSERT_EQ(openState(worldRoot), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(openState(worldRoot)), "");
     furnishHomes();
     ASSERT_EQ(setSecurity(R"({"user_chroot": true})").code, 0) << lastErrorSentence();
     lastEntry_ = logEntries().back().id;

@@ -4,6 +4,7 @@
 #include "platform/sftp.h"
 #include "standalone/core/last_error.h"
 #include "standalone/standalone.h"
+#include "tests/support/result.h"
 
 #include <unistd.h>
 
@@ -47,7 +48,7 @@ void UnderSystemd::SetUp() {
 
 void openMachine() {
     ::setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
-    ASSERT_EQ(openState("/"), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(openState("/")), "");
     std::ofstream("/home/alice/home-of") << "alice";
     ASSERT_TRUE(fs::is_directory("/run/systemd/system"));
 }
@@ -97,7 +98,7 @@ bool comesTrue(const std::function<bool()>& condition, milliseconds limit) {
 bool isBack(const std::string& service, const ProcessId& former) {
     return comesTrue(
         [&] {
-            const ServiceState state = serviceState(service);
+            const DaemonState state = serviceState(service);
             return state.daemon != former && isServing(state);
         },
         seconds(2));

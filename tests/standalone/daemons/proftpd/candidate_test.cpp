@@ -1,12 +1,12 @@
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
+#include "standalone/core/scratch_folder.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemons/candidate.h"
-#include "standalone/daemons/configuration_test.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "standalone/process/last_words.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/daemons/proftpd/example.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 
@@ -32,11 +32,11 @@ protected:
 TEST_F(FtpCandidate, isTakenWithAllServicesOn) {
     FtpSettings settings = plainSettings();
     settings.record.service_flags = VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS;
-    EXPECT_EQ(testFtpCandidate(settings), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(testFtpCandidate(settings)), "");
 }
 
 TEST_F(FtpCandidate, leavesNothingOfTheTestBehind) {
-    ASSERT_EQ(testFtpCandidate(plainSettings()), 0) << lastErrorSentence();
+    ASSERT_EQ(messageOf(testFtpCandidate(plainSettings())), "");
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
@@ -44,7 +44,7 @@ TEST_F(FtpCandidate, isTestedWithAThrowAwayCertificateWhereNothingMayBeStored) {
     setEffectHook([](Effect, std::string_view) { return EffectDecision(Result<>()); });
     FtpSettings settings = plainSettings();
     settings.record.service_flags = VELT_FTP_SERVICE_TLS;
-    EXPECT_EQ(testFtpCandidate(settings), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(testFtpCandidate(settings)), "");
     setEffectHook({});
     EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/tls"));
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
@@ -53,36 +53,34 @@ TEST_F(FtpCandidate, isTestedWithAThrowAwayCertificateWhereNothingMayBeStored) {
 TEST_F(FtpCandidate, isRefusedInTheDaemonsOwnWords) {
     FtpSettings settings = plainSettings();
     settings.timeout = -1;
-    EXPECT_LT(testFtpCandidate(settings), 0);
-    EXPECT_EQ(lastErrorSentence().find("The FTP daemon refuses its configuration: TimeoutIdle: "), 0U)
-        << lastErrorSentence();
+    const std::string refusal = messageOf(testFtpCandidate(settings));
+    EXPECT_TRUE(refusal.starts_with("The FTP daemon refuses its configuration: TimeoutIdle: ")) << refusal;
 }
 
 TEST_F(FtpCandidate, isRefusedForACertificateThatIsNone) {
     root_.write("etc/velt/tls/server.crt", "nonsense");
     root_.write("etc/velt/tls/server.key", "nonsense");
     FtpSettings settings = plainSettings();
-    EXPECT_EQ(testFtpCandidate(settings), 0) << "without FTPS nobody asks for it";
+    EXPECT_EQ(messageOf(testFtpCandidate(settings)), "") << "without FTPS nobody asks for it";
     settings.record.service_flags = VELT_FTP_SERVICE_TLS;
-    EXPECT_LT(testFtpCandidate(settings), 0);
-    EXPECT_NE(lastErrorSentence().find("server.crt holds no certificate"), std::string::npos)
-        << lastErrorSentence();
+    const std::string refusal = messageOf(testFtpCandidate(settings));
+    EXPECT_NE(refusal.find("server.crt holds no certificate"), std::string::npos) << refusal;
 }
 
 TEST_F(FtpCandidate, isRefusedBelowARootThatTheConfigurationCannotName) {
     setStateRoot(root_.path() / "100%u");
-    EXPECT_LT(testFtpCandidate(plainSettings()), 0);
-    EXPECT_NE(lastErrorSentence().find("cannot hold"), std::string::npos) << lastErrorSentence();
+    const std::string refusal = messageOf(testFtpCandidate(plainSettings()));
+    EXPECT_NE(refusal.find("cannot hold"), std::string::npos) << refusal;
 }
 
 TEST_F(FtpCandidate, whatAKilledProcessLeftIsSweptAndWhatIsInUseStays) {
     root_.write("run/velt/test.Killed/key", "private");
     root_.write("run/velt/ftp/proftpd.conf", "in use");
-    const ScratchFolder used;
-    ASSERT_TRUE(used);
-    ASSERT_EQ(openState(root_.path()), 0) << lastErrorSentence();
+    const auto used = ScratchFolder::make();
+    ASSERT_EQ(messageOf(used), "");
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
     EXPECT_FALSE(std::filesystem::exists(root_.path() / "run/velt/test.Killed"));
-    EXPECT_TRUE(std::filesystem::exists(used.path()));
+    EXPECT_TRUE(std::filesystem::exists(used->path()));
     EXPECT_EQ(root_.read("run/velt/ftp/proftpd.conf"), "in use");
 }
 

@@ -2,7 +2,7 @@
 #ifndef VELT_TESTS_STANDALONE_DAEMONS_PROFTPD_EXAMPLE_H
 #define VELT_TESTS_STANDALONE_DAEMONS_PROFTPD_EXAMPLE_H
 
-#include "standalone/daemons/proftpd/render.h"
+#include "standalone/daemons/proftpd/proftpd_configuration.h"
 
 #include <cstring>
 

@@ -1,3 +1,4 @@
+#include "standalone/daemons/daemon_configuration.h"
 #include "tests/standalone/daemons/proftpd/example.h"
 
 #include <gtest/gtest.h>

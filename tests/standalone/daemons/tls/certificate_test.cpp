@@ -1,11 +1,11 @@
 #include "base/sha256.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/daemons/tls/self_signed.h"
 #include "standalone/process/run_program.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -67,8 +67,8 @@ protected:
         root_.write("etc/velt/tls/server.key", pair.key);
     }
     static void expectRefusal(const std::string& part) {
-        EXPECT_FALSE(serverCertificate());
-        EXPECT_TRUE(contains(lastErrorSentence(), part)) << lastErrorSentence();
+        const std::string refusal = messageOf(serverCertificate());
+        EXPECT_TRUE(contains(refusal, part)) << refusal;
     }
 
     TemporaryFolder root_;
@@ -76,7 +76,7 @@ protected:
 
 TEST_F(ServerCertificates, areMadeOnceAndKeptPrivate) {
     const auto first = serverCertificate();
-    ASSERT_TRUE(first) << lastErrorSentence();
+    ASSERT_EQ(messageOf(first), "");
     EXPECT_FALSE(first->isRsa);
     struct stat facts {};
     ASSERT_EQ(stat(first->key.c_str(), &facts), 0);
@@ -92,15 +92,17 @@ TEST_F(ServerCertificates, areForATestOnlyWhereNothingMayBeStored) {
         effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
         return EffectDecision(Result<>());
     });
-    auto certificate = serverCertificate();
+    std::filesystem::path key;
+    {
+        const auto certificate = serverCertificate();
+        ASSERT_EQ(messageOf(certificate), "");
+        key = certificate->key;
+        EXPECT_TRUE(std::filesystem::exists(key));
+    }
     setEffectHook({});
-    ASSERT_TRUE(certificate) << lastErrorSentence();
-    EXPECT_EQ(effects, std::vector<std::string>{"store certificate"});
-    const auto key = certificate->key;
-    EXPECT_TRUE(std::filesystem::exists(key));
-    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/tls"));
-    certificate.reset();
     EXPECT_FALSE(std::filesystem::exists(key));
+    EXPECT_EQ(effects, std::vector<std::string>{"store certificate"});
+    EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/tls"));
 }
 
 TEST_F(ServerCertificates, areMadeAnewWhenKeyAndCertificateDoNotMatch) {
@@ -108,7 +110,7 @@ TEST_F(ServerCertificates, areMadeAnewWhenKeyAndCertificateDoNotMatch) {
     ASSERT_TRUE(first);
     root_.write("var/lib/velt/tls/server.key", makeSelfSigned({"h", {}})->key);
     const auto second = serverCertificate();
-    ASSERT_TRUE(second) << lastErrorSentence();
+    ASSERT_EQ(messageOf(second), "");
     EXPECT_NE(second->fingerprint, first->fingerprint);
 }
 
@@ -116,7 +118,7 @@ TEST_F(ServerCertificates, ofTheAdministratorComeFirst) {
     ASSERT_TRUE(serverCertificate());
     give(*makeSelfSigned({"given", {}}));
     const auto found = serverCertificate();
-    ASSERT_TRUE(found) << lastErrorSentence();
+    ASSERT_EQ(messageOf(found), "");
     EXPECT_EQ(found->certificate, root_.path() / "etc/velt/tls/server.crt");
 }
 
@@ -149,7 +151,7 @@ TEST_F(ServerCertificates, mayHaveAnRsaKey) {
                   .exitCode,
               0);
     const auto found = serverCertificate();
-    ASSERT_TRUE(found) << lastErrorSentence();
+    ASSERT_EQ(messageOf(found), "");
     EXPECT_TRUE(found->isRsa);
     ASSERT_EQ(runProcess({"openssl", "req", "-x509", "-newkey", "ed25519", "-nodes", "-subj", "/CN=x",
                           "-keyout", key, "-out", certificate})

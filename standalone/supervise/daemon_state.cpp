@@ -1,4 +1,4 @@
-#include "standalone/supervise/service_state.h"
+#include "standalone/supervise/daemon_state.h"
 
 #include "standalone/process/listening_sockets.h"
 
@@ -6,6 +6,7 @@
 #include <array>
 #include <cerrno>
 #include <cstdio>
+#include <cstring>
 #include <fstream>
 #include <sstream>
 #include <string_view>
@@ -52,7 +53,7 @@ ProcessId readProcess(std::istream& fields) {
     return fields ? process : ProcessId{};
 }
 
-void takeLine(const std::string& line, ServiceState& state) {
+void takeLine(const std::string& line, DaemonState& state) {
     std::istringstream fields(line);
     std::string key;
     fields >> key >> std::ws;
@@ -79,7 +80,7 @@ void takeLine(const std::string& line, ServiceState& state) {
     }
 }
 
-std::string render(const ServiceState& state) {
+std::string render(const DaemonState& state) {
     std::ostringstream text;
     const auto processLine = [&text](std::string_view key, const ProcessId& process) {
         if (process) {
@@ -105,19 +106,19 @@ std::string render(const ServiceState& state) {
 
 } // namespace
 
-std::filesystem::path stateFile(const std::filesystem::path& directory, const std::string& service) {
-    return directory / (service + ".state");
+std::filesystem::path stateFile(const std::filesystem::path& folder, const std::string& daemon) {
+    return folder / (daemon + ".state");
 }
 
-std::filesystem::path lockFile(const std::filesystem::path& directory, const std::string& service) {
-    return directory / (service + ".lock");
+std::filesystem::path lockFile(const std::filesystem::path& folder, const std::string& daemon) {
+    return folder / (daemon + ".lock");
 }
 
-std::filesystem::path orderFile(const std::filesystem::path& directory, const std::string& service) {
-    return directory / (service + ".order");
+std::filesystem::path orderFile(const std::filesystem::path& folder, const std::string& daemon) {
+    return folder / (daemon + ".order");
 }
 
-std::optional<ServiceState> readServiceState(const std::filesystem::path& file) {
+std::optional<DaemonState> readDaemonState(const std::filesystem::path& file) {
     std::ifstream input(file);
     std::string line;
     if (!std::getline(input, line) || line != firstLine) {
@@ -126,28 +127,27 @@ std::optional<ServiceState> readServiceState(const std::filesystem::path& file) 
     if (!std::getline(input, line) || line != std::string(bootKey) + bootId()) {
         return std::nullopt;
     }
-    ServiceState state;
+    DaemonState state;
     while (std::getline(input, line)) {
         takeLine(line, state);
     }
     return state;
 }
 
-bool writeServiceState(const std::filesystem::path& file, const ServiceState& state) {
+Result<> writeDaemonState(const std::filesystem::path& file, const DaemonState& state) {
     std::filesystem::path fresh = file;
     fresh += ".new";
-    {
-        std::ofstream output(fresh, std::ios::trunc);
-        output << render(state);
-        if (!output.flush()) {
-            return false;
-        }
-    }
+    std::ofstream output(fresh, std::ios::trunc);
+    output << render(state);
+    output.close();
     // Without fsync: the file describes processes, which do not outlive the machine either.
-    return std::rename(fresh.c_str(), file.c_str()) == 0;
+    if (!output || std::rename(fresh.c_str(), file.c_str()) != 0) {
+        return Error("cannot write " + file.string() + ": " + std::strerror(errno));
+    }
+    return {};
 }
 
-bool isServing(const ServiceState& state) {
+bool isServing(const DaemonState& state) {
     if (state.state != RunState::running || !isAlive(state.daemon)) {
         return false;
     }
@@ -155,7 +155,7 @@ bool isServing(const ServiceState& state) {
                        [&state](int port) { return listensOn(state.daemon.pid, port); });
 }
 
-bool endLeftovers(const ServiceState& state) {
+bool endLeftovers(const DaemonState& state) {
     std::vector<ProcessId> known = state.sessions;
     known.push_back(state.daemon);
     const auto remaining = [&known] {

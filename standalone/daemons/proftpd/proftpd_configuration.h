@@ -1,6 +1,6 @@
 // The text of the FTP daemon's configuration.
-#ifndef VELT_STANDALONE_DAEMONS_PROFTPD_RENDER_H
-#define VELT_STANDALONE_DAEMONS_PROFTPD_RENDER_H
+#ifndef VELT_STANDALONE_DAEMONS_PROFTPD_PROFTPD_CONFIGURATION_H
+#define VELT_STANDALONE_DAEMONS_PROFTPD_PROFTPD_CONFIGURATION_H
 
 #include "standalone/settings/settings.h"
 
@@ -34,10 +34,6 @@ struct ProftpdPlaces {
     bool loopbackOnly = false;                ///< clients of this machine only, over IPv4
     std::optional<AccountFiles> accountFiles; ///< absent: the server's users, through PAM
 };
-
-/// Whether the path can stand in the configuration: absolute, of at most 1024 bytes, and without the
-/// characters that mean something to the daemon even between quotes.
-bool isRenderable(const std::filesystem::path& path);
 
 /// The whole configuration. The settings have passed checkFtpSettings, the places isRenderable. A pure
 /// function.

@@ -1,6 +1,6 @@
 // The text of the SFTP daemon's configuration.
-#ifndef VELT_STANDALONE_DAEMONS_SSHD_RENDER_H
-#define VELT_STANDALONE_DAEMONS_SSHD_RENDER_H
+#ifndef VELT_STANDALONE_DAEMONS_SSHD_SSHD_CONFIGURATION_H
+#define VELT_STANDALONE_DAEMONS_SSHD_SSHD_CONFIGURATION_H
 
 #include "standalone/settings/settings.h"
 

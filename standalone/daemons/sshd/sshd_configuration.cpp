@@ -1,4 +1,4 @@
-#include "standalone/daemons/sshd/render.h"
+#include "standalone/daemons/sshd/sshd_configuration.h"
 
 namespace velt {
 

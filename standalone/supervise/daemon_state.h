@@ -1,7 +1,8 @@
-// What is known about a supervised service: a small file that its supervisor keeps, for everybody who asks.
-#ifndef VELT_STANDALONE_SUPERVISE_SERVICE_STATE_H
-#define VELT_STANDALONE_SUPERVISE_SERVICE_STATE_H
+// What is known about a supervised daemon: a small file that its supervisor keeps, for all who ask.
+#ifndef VELT_STANDALONE_SUPERVISE_DAEMON_STATE_H
+#define VELT_STANDALONE_SUPERVISE_DAEMON_STATE_H
 
+#include "base/result.h"
 #include "standalone/process/process_identity.h"
 
 #include <cstdint>
@@ -19,7 +20,7 @@ enum class RunState {
     failed, ///< the daemon did not start, or ended and did not come back yet
 };
 
-struct ServiceState {
+struct DaemonState {
     RunState state = RunState::stopped;
     ProcessId supervisor;            ///< none when it ended after a failed start
     ProcessId daemon;                ///< none while paused or failed
@@ -30,23 +31,23 @@ struct ServiceState {
     std::uint64_t restarts = 0;      ///< of the daemon, after it had ended by itself
 };
 
-/// The files of a service in the folder that holds all of them.
-std::filesystem::path stateFile(const std::filesystem::path& directory, const std::string& service);
-std::filesystem::path lockFile(const std::filesystem::path& directory, const std::string& service);
-std::filesystem::path orderFile(const std::filesystem::path& directory, const std::string& service);
+/// The files of a daemon in the folder that holds those of all.
+std::filesystem::path stateFile(const std::filesystem::path& folder, const std::string& daemon);
+std::filesystem::path lockFile(const std::filesystem::path& folder, const std::string& daemon);
+std::filesystem::path orderFile(const std::filesystem::path& folder, const std::string& daemon);
 
 /// Nothing when there is no such file, not one of this form, or one from before the machine started: its
 /// processes are gone, and others may have their numbers.
-std::optional<ServiceState> readServiceState(const std::filesystem::path& file);
+std::optional<DaemonState> readDaemonState(const std::filesystem::path& file);
 
-/// Replaces the file; it is whole at every moment. False on failure, errno says why.
-bool writeServiceState(const std::filesystem::path& file, const ServiceState& state);
+/// Replaces the file; it is whole at every moment.
+Result<> writeDaemonState(const std::filesystem::path& file, const DaemonState& state);
 
-/// Whether the service does what its file says: the daemon lives and itself listens on its ports.
-bool isServing(const ServiceState& state);
+/// Whether the daemon does what its file says: it lives and listens on its ports itself.
+bool isServing(const DaemonState& state);
 
-/// Ends everything that a supervisor which is gone left behind. False when something resists.
-bool endLeftovers(const ServiceState& state);
+/// Ends everything that a former supervisor left behind. False when some of it does not end.
+bool endLeftovers(const DaemonState& state);
 
 } // namespace velt
 

@@ -1,11 +1,11 @@
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/daemons/candidate.h"
 #include "standalone/daemons/sshd/host_keys.h"
-#include "standalone/daemons/sshd/render.h"
+#include "standalone/daemons/sshd/sshd_configuration.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
 #include "tests/standalone/support/golden.h"
 #include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/result.h"
 
 #include <sys/stat.h>
 
@@ -47,14 +47,13 @@ protected:
 };
 
 TEST_F(SftpCandidate, isTakenAndLeavesNothingButTheKeys) {
-    EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
+    EXPECT_EQ(messageOf(testSftpCandidate({true, 2222})), "");
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
 TEST_F(SftpCandidate, isRefusedInTheDaemonsOwnWords) {
-    EXPECT_LT(testSftpCandidate({true, 65536}), 0);
-    EXPECT_NE(lastErrorSentence().find("Badly formatted port number"), std::string::npos)
-        << lastErrorSentence();
+    const std::string refusal = messageOf(testSftpCandidate({true, 65536}));
+    EXPECT_NE(refusal.find("Badly formatted port number"), std::string::npos) << refusal;
 }
 
 TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
@@ -64,8 +63,8 @@ TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
             effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
             return EffectDecision(Result<>());
         });
-        EXPECT_EQ(testSftpCandidate({true, 2222}), 0) << lastErrorSentence();
-        EXPECT_LT(testSftpCandidate({true, 65536}), 0);
+        EXPECT_EQ(messageOf(testSftpCandidate({true, 2222})), "");
+        EXPECT_NE(messageOf(testSftpCandidate({true, 65536})), "");
     }).join();
     EXPECT_EQ(effects, (std::vector<std::string>{"store host keys", "store host keys"}));
     EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/ssh"));
@@ -74,11 +73,11 @@ TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
 
 TEST_F(SftpCandidate, keepsItsKeys) {
     const auto keys = hostKeys();
-    ASSERT_TRUE(keys) << lastErrorSentence();
-    ASSERT_EQ(keys->size(), 2U);
+    ASSERT_EQ(messageOf(keys), "");
+    ASSERT_EQ(keys->files.size(), 2U);
     const std::string first = root_.read("var/lib/velt/ssh/host_ed25519_key");
     EXPECT_NE(first, "");
-    for (const auto& key : *keys) {
+    for (const auto& key : keys->files) {
         struct stat facts {};
         ASSERT_EQ(stat(key.c_str(), &facts), 0);
         EXPECT_EQ(facts.st_mode & 07777, 0600U);

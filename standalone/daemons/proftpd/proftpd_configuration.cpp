@@ -1,4 +1,4 @@
-#include "standalone/daemons/proftpd/render.h"
+#include "standalone/daemons/proftpd/proftpd_configuration.h"
 
 #include "base/ipv4.h"
 
@@ -209,13 +209,6 @@ void renderAnonymous(Text& text, const FtpSettings& settings, const ProftpdPlace
 }
 
 } // namespace
-
-bool isRenderable(const std::filesystem::path& path) {
-    const std::string text = path.string();
-    return path.is_absolute() && text.size() <= 1024 && std::ranges::none_of(text, [](unsigned char c) {
-               return c < 0x20 || c == 0x7f || c == '"' || c == '\\' || c == '%' || c == '*';
-           });
-}
 
 std::string renderProftpd(const FtpSettings& settings, const ProftpdPlaces& places) {
     Text text;

@@ -1,0 +1,51 @@
+#include "standalone/control/start_services.h"
+
+#include "standalone/control/daemon_control.h"
+#include "standalone/control/service_firewall.h"
+#include "standalone/core/effects.h"
+
+#include <syslog.h>
+
+#include <utility>
+
+namespace velt {
+namespace {
+
+Result<> stop(const Daemon& daemon) {
+    return perform(Effect::stop, daemon.name, [&] { return stopDaemon(daemon); });
+}
+
+Result<> followSettings(const Daemon& daemon) {
+    const auto settings = daemon.settings();
+    if (!settings) {
+        return settings.error();
+    }
+    return settings->enabled() ? perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); })
+                               : stop(daemon);
+}
+
+/// Does it with each daemon, whatever becomes of the others, and returns the first failure.
+Result<> forEachDaemon(Result<> (*act)(const Daemon&)) {
+    Result<> outcome;
+    for (const Daemon* daemon : allDaemons()) {
+        auto done = act(*daemon);
+        if (!done) {
+            ::syslog(LOG_ERR, "%s", done.error().message.c_str());
+            outcome = outcome ? std::move(done) : outcome;
+        }
+    }
+    return outcome;
+}
+
+} // namespace
+
+Result<> startEnabledServices() {
+    followWithFirewall(); // its rules went with the boot as well
+    return forEachDaemon(followSettings);
+}
+
+Result<> stopServices() {
+    return forEachDaemon(stop);
+}
+
+} // namespace velt

@@ -1,0 +1,156 @@
+#include "standalone/control/supervised_daemon.h"
+
+#include "standalone/control/child_launcher.h"
+#include "standalone/control/systemd_launcher.h"
+#include "standalone/core/error_number.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/state_root.h"
+#include "standalone/ports/port_probe.h"
+#include "standalone/supervise/control_channel.h"
+
+#include <syslog.h>
+
+#include <chrono>
+#include <optional>
+#include <system_error>
+#include <thread>
+#include <utility>
+
+namespace velt {
+namespace {
+
+using std::chrono::milliseconds;
+
+// A start is promised to be over within five seconds, of which the supervisor allows itself a little less. An
+// end that takes longer than this is taken out of the supervisor's hands.
+constexpr milliseconds startLimit{4900};
+constexpr milliseconds endLimit{6000};
+constexpr milliseconds farewellLimit{500};
+
+std::unique_ptr<SupervisorLauncher> launcherFor(const Daemon& daemon) {
+    if (systemdKeepsSupervisors()) {
+        return std::make_unique<SystemdLauncher>(daemon);
+    }
+    return std::make_unique<ChildLauncher>(daemon.name);
+}
+
+/// Whether the process ends within a moment. A supervisor whose daemon could not be started does, and answers
+/// no more.
+bool isGoneSoon(const ProcessId& process) {
+    const auto deadline = std::chrono::steady_clock::now() + farewellLimit;
+    while (isAlive(process)) {
+        if (std::chrono::steady_clock::now() >= deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(milliseconds(2));
+    }
+    return true;
+}
+
+} // namespace
+
+SupervisedDaemon::SupervisedDaemon(const Daemon& daemon) : SupervisedDaemon(daemon, launcherFor(daemon)) {}
+
+SupervisedDaemon::SupervisedDaemon(const Daemon& daemon, std::unique_ptr<SupervisorLauncher> launcher)
+    : daemon_(daemon), name_(daemon.name), launcher_(std::move(launcher)) {}
+
+Result<> SupervisedDaemon::start(const DaemonOrder& order) {
+    const auto folder = runFolder();
+    if (!folder) {
+        return folder.error();
+    }
+    const DaemonState now = daemonState(daemon_);
+    const bool supervised = isAlive(now.supervisor);
+    if (supervised && isServing(now) && now.configurationHash == order.configurationHash) {
+        return {};
+    }
+    if (const auto free = probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0); !free) {
+        return free;
+    }
+    const auto started =
+        supervised ? handOver(*folder, now.supervisor, order) : launcher_->launch(*folder, order);
+    return started ? Result<>() : failure("does not start", started.error().message);
+}
+
+/// Gives the order to the running supervisor.
+Result<> SupervisedDaemon::handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
+                                    const DaemonOrder& order) {
+    const auto answer = askSupervisor(folder, name_, {Command::start, order}, startLimit);
+    if (!answer) {
+        return isGoneSoon(supervisor)
+                   ? launcher_->launch(folder, order)
+                   : Error("its supervisor, process " + std::to_string(supervisor.pid) + ", does not answer");
+    }
+    if (!*answer) {
+        return *answer;
+    }
+    // The daemon serves; that it would not come back as it is now is no failure of its start.
+    if (const auto kept = launcher_->keep(folder, order); !kept) {
+        ::syslog(LOG_ERR, "%s would come back with its former settings: %s", titleOf(daemon_).c_str(),
+                 kept.error().message.c_str());
+    }
+    return {};
+}
+
+Error SupervisedDaemon::failure(const std::string& what, std::string reason, SourcePlace where) const {
+    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
+        reason.pop_back(); // daemons end their sentences as they like
+    }
+    return {ErrorNumber::daemon, titleOf(daemon_) + " " + what + ": " + reason + ".", where};
+}
+
+Result<> SupervisedDaemon::pause() {
+    if (!isAlive(daemonState(daemon_).supervisor)) {
+        // Without a supervisor nobody could end the sessions later, once their listener is gone and no longer
+        // shows which are its own.
+        return stop();
+    }
+    const auto answer = askSupervisor(statePath(paths::run), name_, {Command::pause, {}}, endLimit);
+    const auto paused = answer.value_or(Error("its supervisor does not answer"));
+    return paused ? Result<>() : failure("cannot be paused", paused.error().message);
+}
+
+Result<> SupervisedDaemon::stop() {
+    const DaemonState now = daemonState(daemon_);
+    std::optional<Result<>> answer;
+    if (isAlive(now.supervisor)) {
+        answer = askSupervisor(statePath(paths::run), name_, {Command::stop, {}}, endLimit);
+    }
+    const auto ended = answer && !*answer ? *answer : launcher_->retire();
+    if (!ended) {
+        return failure("cannot be stopped", ended.error().message);
+    }
+    // What is left: a supervisor on its last lines, one that hangs, or the daemon of one that was killed.
+    DaemonState left = now;
+    left.sessions.push_back(now.supervisor);
+    if (!endLeftovers(left)) {
+        return failure("cannot be stopped", "some of its processes do not end");
+    }
+    std::error_code ignored;
+    std::filesystem::remove(stateFile(statePath(paths::run), name_), ignored);
+    return {};
+}
+
+DaemonState daemonState(const Daemon& daemon) {
+    return readDaemonState(stateFile(statePath(paths::run), std::string(daemon.name)))
+        .value_or(DaemonState{});
+}
+
+bool systemdKeepsSupervisors() {
+    // Units are the machine's, so an installation below another root keeps its daemons to itself.
+    std::error_code error;
+    return std::filesystem::is_directory("/run/systemd/system", error) && statePath("/") == "/";
+}
+
+Result<std::filesystem::path> runFolder() {
+    const std::filesystem::path folder = statePath(paths::run);
+    std::error_code error;
+    std::filesystem::create_directories(folder, error);
+    if (error) {
+        return Error(ErrorNumber::store,
+                     "Cannot make the folder " + folder.string() + ": " + error.message() + ".");
+    }
+    return folder;
+}
+
+} // namespace velt

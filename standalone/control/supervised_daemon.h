@@ -1,0 +1,58 @@
+// A daemon under velt-supervise: one supervisor for each daemon, which systemd looks after where it runs the
+// machine.
+#ifndef VELT_STANDALONE_CONTROL_SUPERVISED_DAEMON_H
+#define VELT_STANDALONE_CONTROL_SUPERVISED_DAEMON_H
+
+#include "base/result.h"
+#include "standalone/control/supervisor_launcher.h"
+#include "standalone/daemons/daemon.h"
+#include "standalone/supervise/daemon_state.h"
+
+#include <filesystem>
+#include <memory>
+#include <string>
+
+namespace velt {
+
+/// Speaks to the daemon's supervisor, and has the launcher start one where none runs. Its operations come one
+/// at a time.
+class SupervisedDaemon {
+public:
+    /// With the launcher that suits this machine.
+    explicit SupervisedDaemon(const Daemon& daemon);
+    SupervisedDaemon(const Daemon& daemon, std::unique_ptr<SupervisorLauncher> launcher);
+
+    /// Makes the daemon run as ordered. Does nothing when one with the same configuration serves already;
+    /// otherwise probes the ports, ends the listener that runs, and returns when the new one listens. Fails
+    /// within 5 s with the daemon's reason.
+    Result<> start(const DaemonOrder& order);
+
+    /// Ends the listener only, and waits for its end. Does nothing when it does not run.
+    Result<> pause();
+
+    /// Ends the listener and its sessions, and waits for their end. Does nothing when it does not run.
+    Result<> stop();
+
+private:
+    Result<> handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
+                      const DaemonOrder& order);
+    Error failure(const std::string& what, std::string reason,
+                  SourcePlace where = SourcePlace::current()) const;
+
+    const Daemon& daemon_;
+    std::string name_;
+    std::unique_ptr<SupervisorLauncher> launcher_;
+};
+
+/// What is known about the daemon now. May be asked at any time.
+DaemonState daemonState(const Daemon& daemon);
+
+/// Whether systemd starts a supervisor again that was killed.
+bool systemdKeepsSupervisors();
+
+/// The folder of the files about running daemons, which is made when it is missing.
+Result<std::filesystem::path> runFolder();
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,77 @@
+#include "standalone/core/scratch_folder.h"
+
+#include "base/file.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/state_lock.h"
+#include "standalone/core/state_root.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+
+#include <cstdlib>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace velt {
+
+namespace {
+
+constexpr std::string_view prefix = "test.";
+
+UniqueFd lockedFolder(const std::filesystem::path& path) {
+    UniqueFd folder(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    return folder && ::flock(folder.get(), LOCK_EX | LOCK_NB) == 0 ? std::move(folder) : UniqueFd();
+}
+
+} // namespace
+
+ScratchFolder::ScratchFolder(std::filesystem::path path, UniqueFd lock)
+    : path_(std::move(path)), lock_(std::move(lock)) {}
+
+Result<ScratchFolder> ScratchFolder::make() {
+    // Keeps a sweep away until the folder has its lock.
+    const auto making = StateLock::take();
+    if (!making) {
+        return making.error();
+    }
+    const auto parent = statePath(paths::run);
+    std::error_code error;
+    std::filesystem::create_directories(parent, error);
+    std::string path = (parent / (std::string(prefix) + "XXXXXX")).string();
+    if (mkdtemp(path.data()) == nullptr) {
+        return cannot("make a folder in", parent);
+    }
+    UniqueFd lock = lockedFolder(path);
+    if (!lock) {
+        return cannot("lock", path);
+    }
+    return ScratchFolder(path, std::move(lock));
+}
+
+ScratchFolder::~ScratchFolder() {
+    if (lock_) {
+        std::error_code error;
+        std::filesystem::remove_all(path_, error);
+    }
+}
+
+void sweepScratchFolders() {
+    const auto nobodyMakesOne = StateLock::take();
+    if (!nobodyMakesOne) {
+        return;
+    }
+    std::error_code error;
+    std::vector<std::filesystem::path> abandoned;
+    for (const auto& entry : std::filesystem::directory_iterator(statePath(paths::run), error)) {
+        if (entry.path().filename().string().starts_with(prefix) && lockedFolder(entry.path())) {
+            abandoned.push_back(entry.path());
+        }
+    }
+    for (const auto& folder : abandoned) {
+        std::filesystem::remove_all(folder, error);
+    }
+}
+
+} // namespace velt

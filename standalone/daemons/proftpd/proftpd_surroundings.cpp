@@ -1,0 +1,136 @@
+#include "standalone/daemons/proftpd/proftpd_surroundings.h"
+
+#include "base/unique_fd.h"
+#include "standalone/accounts/user_directory.h"
+#include "standalone/core/error_number.h"
+#include "standalone/core/installed_files.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/state_root.h"
+#include "standalone/daemons/daemon_configuration.h"
+#include "standalone/daemons/tls/certificate.h"
+#include "standalone/settings/network_settings.h"
+#include "standalone/shares/share_store.h"
+
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+namespace velt {
+namespace {
+
+const std::string anonymousAccount = "ftp";
+
+bool hasIPv6() {
+    const UniqueFd socket(::socket(AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    sockaddr_in6 any{};
+    any.sin6_family = AF_INET6;
+    return socket && bind(socket.get(), reinterpret_cast<const sockaddr*>(&any), sizeof any) == 0;
+}
+
+// The daemon would grant the login all the same, under an account of its own choice.
+Result<> checkAnonymousAccount(const FtpSettings& settings) {
+    if (settings.record.anonymous == 0) {
+        return {};
+    }
+    const auto account = userByName(anonymousAccount);
+    if (!account) {
+        return Error(ErrorNumber::invalid, "Anonymous FTP needs the account \"ftp\", which does not exist.");
+    }
+    if (account->uid == 0) {
+        return Error(ErrorNumber::invalid, "Anonymous FTP cannot use the account \"ftp\", which is root's.");
+    }
+    return {};
+}
+
+// Logins follow the shares that are stored then. That these cannot be read is better said at once.
+Result<> checkShares(const FtpSettings& settings) {
+    const auto& record = settings.record;
+    if (record.anonymous == 0 && record.user_chroot != 0) {
+        return {};
+    }
+    const auto shares = loadShares();
+    return shares ? Result<>() : shares.error();
+}
+
+Result<> surveyCertificate(FtpSurroundings& found) {
+    const auto certificate = serverCertificate();
+    if (!certificate) {
+        return certificate.error();
+    }
+    found.places.certificate = certificate->certificate;
+    found.places.certificateKey = certificate->key;
+    found.places.certificateIsRsa = certificate->isRsa;
+    found.certificateFingerprint = certificate->fingerprint;
+    found.throwAway = certificate->throwAway;
+    return {};
+}
+
+bool isPlainName(const std::string& name) {
+    return name.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789._-") ==
+           std::string::npos;
+}
+
+// Without root's rights the daemon stays who it is, and knows the accounts of its own files only.
+Result<> surveyRights(ProftpdPlaces& places) {
+    if (geteuid() == 0) {
+        return {};
+    }
+    const auto self = userById(geteuid());
+    const auto group = groupById(getegid());
+    if (!self || !group || !isPlainName(self->name) || !isPlainName(group->name)) {
+        return Error(ErrorNumber::invalid, "The FTP daemon cannot run as the user of this process.");
+    }
+    places.user = self->name;
+    places.group = group->name;
+    places.accountFiles = AccountFiles{statePath(paths::ftpPasswd), statePath(paths::ftpGroup)};
+    return {};
+}
+
+Result<ProftpdPlaces> ownPlaces() {
+    ProftpdPlaces places;
+    places.moduleFolder = installedFile("mod_velt_login.so").parent_path();
+    places.runFolder = statePath(paths::ftpRun);
+    places.loginProgram = installedFile("velt-login-view");
+    places.stateRoot = statePath("/");
+    places.loginRoot = places.runFolder / "root";
+    // As long as the place in the plan's own folder, whose name is known only when all of this is.
+    places.anonymousShare = places.runFolder / "configurations" / std::string(64, '0') / "anonymous";
+    places.ipv6 = hasIPv6();
+    if (!isRenderable(places.anonymousShare) || !isRenderable(places.loginProgram)) {
+        return Error(ErrorNumber::invalid,
+                     "The folder " + places.stateRoot.string() + " or " + places.moduleFolder.string() +
+                         " has a name that the FTP daemon's configuration cannot hold.");
+    }
+    const auto network = loadNetworkSettings();
+    if (!network) {
+        return network.error();
+    }
+    places.loopbackOnly = network->loopbackOnly;
+    return places;
+}
+
+} // namespace
+
+Result<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
+    auto places = ownPlaces();
+    if (!places) {
+        return places.error();
+    }
+    FtpSurroundings found{std::move(*places), "", nullptr};
+    const bool tls = (settings.record.service_flags & VELT_FTP_SERVICE_TLS) != 0;
+    if (const auto rights = surveyRights(found.places); !rights) {
+        return rights.error();
+    }
+    if (const auto account = checkAnonymousAccount(settings); !account) {
+        return account.error();
+    }
+    if (const auto shares = checkShares(settings); !shares) {
+        return shares.error();
+    }
+    if (const auto certificate = tls ? surveyCertificate(found) : Result<>(); !certificate) {
+        return certificate.error();
+    }
+    return found;
+}
+
+} // namespace velt

@@ -1,0 +1,46 @@
+// The SFTP daemon's row: an OpenSSH of its own.
+#include "standalone/daemons/daemon.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
+
+#include <array>
+
+namespace velt {
+namespace {
+
+constexpr std::array serviceNames{ServiceName{"sftp", "sftp"}};
+
+constexpr std::array dropIns{
+    // /run/sshd is that unit's, and gone when it is stopped; but each of our connections needs it, too.
+    UnitDropIn{"ssh.service.d/velt-sftp.conf", "[Service]\nRuntimeDirectoryPreserve=yes\n"},
+};
+
+Result<DaemonSettings> readSettings() {
+    const auto stored = loadSftpSettings();
+    if (!stored) {
+        return stored.error();
+    }
+    return DaemonSettings{{{"sftp", stored->enabled}},
+                          {{{stored->port, stored->port}, false, "the SFTP service"}}};
+}
+
+Result<> testStored() {
+    const auto stored = loadSftpSettings();
+    return stored ? testSftpCandidate(*stored) : stored.error();
+}
+
+} // namespace
+
+const Daemon sftpDaemon{
+    .name = "sftp",
+    .label = "SFTP",
+    .apiName = "sftp",
+    .portName = "ssh",
+    .serviceNames = serviceNames,
+    .canPause = true,
+    .dropIns = dropIns,
+    .settings = readSettings,
+    .plan = planSftpDaemon,
+    .test = testStored,
+};
+
+} // namespace velt

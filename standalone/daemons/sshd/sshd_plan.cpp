@@ -1,0 +1,110 @@
+#include "standalone/daemons/sshd/sshd_plan.h"
+
+#include "base/file.h"
+#include "base/sha256.h"
+#include "standalone/core/error_number.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/scratch_folder.h"
+#include "standalone/core/state_lock.h"
+#include "standalone/core/state_root.h"
+#include "standalone/daemons/daemon_configuration.h"
+#include "standalone/daemons/sshd/host_keys.h"
+#include "standalone/daemons/sshd/sshd_configuration.h"
+#include "standalone/settings/network_settings.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+
+namespace velt {
+namespace {
+
+// The daemon starts itself anew for each connection and needs its absolute path for that.
+constexpr const char* program = "/usr/sbin/sshd";
+
+// The daemon has this folder's place built in, so it does not follow the state root; it only has to be there.
+Result<> makeSeparationFolder() {
+    if (geteuid() != 0 || mkdir("/run/sshd", 0755) == 0 || errno == EEXIST) {
+        return {};
+    }
+    return Error(ErrorNumber::daemon,
+                 std::string("Cannot make the folder /run/sshd: ") + std::strerror(errno) + ".");
+}
+
+/// A configuration and what it names.
+struct Rendering {
+    std::string text;
+    HostKeys keys;
+};
+
+Result<Rendering> render(const SftpSettings& settings) {
+    if (const auto made = makeSeparationFolder(); !made) {
+        return made.error();
+    }
+    auto keys = hostKeys();
+    if (!keys) {
+        return keys.error();
+    }
+    if (!isRenderable(keys->files.front())) {
+        return Error(ErrorNumber::invalid,
+                     "The folder " + statePath("/").string() +
+                         " has a name that the SFTP daemon's configuration cannot hold.");
+    }
+    const auto network = loadNetworkSettings();
+    if (!network) {
+        return network.error();
+    }
+    std::string text = renderSshd(settings, {keys->files, geteuid() == 0, network->loopbackOnly});
+    return Rendering{std::move(text), std::move(*keys)};
+}
+
+Result<> testRendering(const std::string& text) {
+    const auto scratch = ScratchFolder::make();
+    if (!scratch) {
+        return scratch.error();
+    }
+    const auto configuration = scratch->path() / "sshd_config";
+    if (const auto written = replaceFile(configuration, text, 0600); !written) {
+        return written;
+    }
+    return runConfigurationTest("SFTP", {program, "-t", "-f", configuration.string()});
+}
+
+} // namespace
+
+Result<> testSftpCandidate(const SftpSettings& settings) {
+    const auto rendering = render(settings);
+    return rendering ? testRendering(rendering->text) : rendering.error();
+}
+
+Result<std::optional<DaemonPlan>> planSftpDaemon() {
+    const auto lock = StateLock::take();
+    if (!lock) {
+        return lock.error();
+    }
+    const auto settings = loadSftpSettings();
+    if (!settings) {
+        return settings.error();
+    }
+    if (const auto checked = checkSftpSettings(*settings); !checked) {
+        return checked.error();
+    }
+    const auto rendering = render(*settings);
+    if (!rendering) {
+        return rendering.error();
+    }
+    if (const auto tested = testRendering(rendering->text); !tested) {
+        return tested.error();
+    }
+    const std::string hash = sha256(rendering->text);
+    const auto folder = statePath(paths::sftpConfigurations) / hash;
+    const auto configuration = folder / "sshd_config";
+    if (const auto written = replaceFile(configuration, rendering->text, 0600); !written) {
+        return written.error();
+    }
+    return DaemonPlan{{hash, {settings->port}, {program, "-D", "-e", "-f", configuration.string()}}, folder};
+}
+
+} // namespace velt

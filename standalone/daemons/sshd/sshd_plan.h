@@ -1,0 +1,23 @@
+// How the SFTP settings become a running daemon.
+#ifndef VELT_STANDALONE_DAEMONS_SSHD_SSHD_PLAN_H
+#define VELT_STANDALONE_DAEMONS_SSHD_SSHD_PLAN_H
+
+#include "base/result.h"
+#include "standalone/daemons/daemon_plan.h"
+#include "standalone/settings/settings.h"
+
+#include <optional>
+
+namespace velt {
+
+/// Puts the configuration that would follow from these settings to the daemon's own test. Nothing that a
+/// running daemon uses is touched.
+Result<> testSftpCandidate(const SftpSettings& settings);
+
+/// The plan that follows from the stored settings, see Daemon::plan: always one, also when they do not enable
+/// SFTP.
+Result<std::optional<DaemonPlan>> planSftpDaemon();
+
+} // namespace velt
+
+#endif
