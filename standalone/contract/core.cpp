@@ -75,7 +75,7 @@ const char* VLIBCSzListGet(const VLIBCSzList* list, int index) {
 
 int VLIBCSzListPush(VLIBCSzList** list, const char* text) {
     if (list == nullptr || *list == nullptr || text == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid, "There is no list or no text to add to it.");
+        return velt::fail(velt::ErrorNumber::invalid, "A list and a text to add to it are required.");
     return velt::atBoundary([&] { return velt::push(*static_cast<velt::StringList*>(*list), text); });
 }
 
@@ -94,7 +94,7 @@ VLIBCSzHash* VLIBCSzHashAlloc(int /*initialSize*/) {
 
 int VLIBCSzHashSetValue(VLIBCSzHash** map, const char* key, const char* value) {
     if (map == nullptr || *map == nullptr || key == nullptr || value == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid, "There is no map, no key or no value to set in it.");
+        return velt::fail(velt::ErrorNumber::invalid, "A map, a key and a value are required.");
     return velt::atBoundary([&] {
         (*map)->entries.insert_or_assign(key, value);
         return 0;
@@ -107,7 +107,7 @@ void VLIBCSzHashFree(VLIBCSzHash* map) {
 
 int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int size, int /*flags*/) {
     if (path == nullptr || key == nullptr || value == nullptr || size < 1)
-        return velt::fail(velt::ErrorNumber::invalid, "There is no file, no key or no room for its value.");
+        return velt::fail(velt::ErrorNumber::invalid, "A file, a key and room for its value are required.");
     return velt::atBoundary([&] {
         const auto found = velt::readKeyValue(velt::statePath(path), key);
         if (!found)
@@ -125,7 +125,7 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
 
 int VLIBCINFOSetKeyValue(const char* key, const char* value) {
     if (key == nullptr || value == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid, "There is no key or no value to write.");
+        return velt::fail(velt::ErrorNumber::invalid, "A key and a value are required.");
     return velt::atBoundary([&]() -> int {
         // A blank stands for no address: whoever may not write an empty text can still take the address away.
         if (key == velt::externalAddressKey)

@@ -91,13 +91,13 @@ Result<> ChildLauncher::launch(const std::filesystem::path& folder, const Daemon
     const auto report = readReport(readEnd.get());
     constexpr std::string_view failure = "failed ";
     if (!report) {
-        return Error("its supervisor does not report in time");
+        return Error("its supervisor did not report in time");
     }
     if (*report == "ready") {
         return {};
     }
     return Error(report->starts_with(failure) ? report->substr(failure.size())
-                                              : "its supervisor ended without a reason");
+                                              : "its supervisor ended without giving a reason");
 }
 
 } // namespace velt

@@ -64,12 +64,13 @@ std::optional<PortConflict> conflictOfForm(const Question& question) {
     for (const int port : {range.first, range.last}) {
         if (port < 1 || port > highestPort) {
             return PortConflict{port, "",
-                                "The port " + std::to_string(port) + " is not one from 1 to " +
+                                "Port " + std::to_string(port) + ": expected a port from 1 to " +
                                     std::to_string(highestPort) + "."};
         }
     }
     if (range.first > range.last) {
-        return PortConflict{range.first, "", "The range " + formatPortRange(range) + " is upside down."};
+        return PortConflict{range.first, "",
+                            "The range " + formatPortRange(range) + " ends before it begins."};
     }
     return std::nullopt;
 }

@@ -47,10 +47,10 @@ Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const Daem
     if (started.exitCode == 0) {
         const auto now = readDaemonState(stateFile(folder, std::string(daemon_.name)));
         return now && isServing(*now) ? Result<>()
-                                      : Error("systemd says that it has started it, but it does not serve");
+                                      : Error("systemd reports a start, but the daemon does not serve");
     }
     const std::string reason =
-        started.exitCode < 0 ? "its supervisor does not report in time" : reasonOfFailure();
+        started.exitCode < 0 ? "its supervisor did not report in time" : reasonOfFailure();
     runProcess({places_.systemctl, "stop", "--no-block", unit_});
     return reason.empty() ? reasonOf(started) : Error(reason);
 }

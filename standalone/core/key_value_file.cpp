@@ -57,15 +57,14 @@ bool isKeyByte(char byte) {
 
 Result<> checkKeyValue(std::string_view key, std::string_view value) {
     if (key.empty() || !std::all_of(key.begin(), key.end(), isKeyByte))
-        return Error(ErrorNumber::invalid,
-                     "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.");
+        return Error(ErrorNumber::invalid, "Expected a key of letters, digits, \"_\", \"-\" and \".\".");
     const std::string name(key);
     if (value.size() > longestValue)
         return Error(ErrorNumber::invalid,
                      "The value of " + name + " is longer than " + std::to_string(longestValue) + " bytes.");
     if (std::any_of(value.begin(), value.end(), isControl))
         return Error(ErrorNumber::invalid,
-                     "The value of " + name + " contains a line end or another control byte.");
+                     "The value of " + name + " contains a line end or another control character.");
     return {};
 }
 

@@ -16,7 +16,7 @@ namespace {
 constexpr off_t longestFile = off_t{16} << 20;
 
 Error refuse(const std::filesystem::path& path, const std::string& why) {
-    return {ErrorNumber::store, "The file " + path.string() + " " + why + "."};
+    return {ErrorNumber::store, path.string() + " " + why + "."};
 }
 
 } // namespace
@@ -28,10 +28,10 @@ Result<std::string> readTrusted(const std::filesystem::path& path) {
         return refuse(path, std::string("cannot be opened: ") + std::strerror(errno));
     }
     if (!S_ISREG(facts.st_mode) || facts.st_size > longestFile) {
-        return refuse(path, "is no file of at most 16 MiB");
+        return refuse(path, "is not a file, or is larger than 16 MiB");
     }
     if ((facts.st_uid != 0 && facts.st_uid != getuid()) || (facts.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
-        return refuse(path, "belongs to another account, or others may write it");
+        return refuse(path, "belongs to another account, or other accounts may write to it");
     }
     std::string text;
     std::array<char, 65536> part{};
@@ -40,7 +40,7 @@ Result<std::string> readTrusted(const std::filesystem::path& path) {
         text.append(part.data(), static_cast<std::size_t>(got));
     }
     if (got < 0 || static_cast<off_t>(text.size()) != facts.st_size) {
-        return refuse(path, "cannot be read as a whole");
+        return refuse(path, "cannot be read to its end");
     }
     return text;
 }

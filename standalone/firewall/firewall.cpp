@@ -34,9 +34,9 @@ std::string firstLine(const std::string& text) {
 Error cannotLoad(const ProcessResult& result) {
     std::string reason(trimmedEnd(firstLine(result.errors), ". ")); // it may be a sentence of its own
     if (reason.find("Operation not permitted") != std::string::npos) {
-        reason = "this process may not administer the network";
+        reason = "this process is not allowed to change the firewall";
     }
-    return {ErrorNumber::firewall, "The firewall rules are not loaded: " + reason + "."};
+    return {ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + "."};
 }
 
 void warnOfForeignTables() {

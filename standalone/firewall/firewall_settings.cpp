@@ -39,7 +39,7 @@ std::vector<VELT_FTP_PORT_RANGE> readPorts(StrictFile& file) {
     for (std::string word; words >> word;) {
         const auto range = parsePortRange(word);
         if (!range) {
-            file.refuse("ports", "ports and ranges of ports with blanks between them, such as 22 8000-8010");
+            file.refuse("ports", "ports and port ranges separated by spaces, such as 22 8000-8010");
             return {};
         }
         ports.push_back(*range);

@@ -38,7 +38,7 @@ std::string renderTime(std::chrono::system_clock::time_point time) {
 }
 
 Error cannotWrite(const std::filesystem::path& path, const char* why) {
-    return {ErrorNumber::event, "The event cannot be written to " + path.string() + ": " + why + "."};
+    return {ErrorNumber::event, "Cannot write the event to " + path.string() + ": " + why + "."};
 }
 
 /// The file under its lock, which keeps other writers from adding their lines in between. Opened anew for
@@ -65,12 +65,12 @@ std::filesystem::path kept(const std::filesystem::path& path, int number) {
 }
 
 /// From the oldest on, so that a process which is killed on the way leaves a number free, and no event lost.
-/// Where a file cannot be put away, the newest grows on: a limit is worth less than an event.
+/// Where a file cannot be renamed, the newest grows on: a limit is worth less than an event.
 void rotate(const std::filesystem::path& path) {
     for (int number = keptEventFiles - 1; number >= 0; --number) {
         const std::filesystem::path from = number == 0 ? path : kept(path, number);
         if (::rename(from.c_str(), kept(path, number + 1).c_str()) != 0 && errno != ENOENT) {
-            ::syslog(LOG_WARNING, "%s cannot be put away: %s", from.c_str(), std::strerror(errno));
+            ::syslog(LOG_WARNING, "cannot rename %s: %s", from.c_str(), std::strerror(errno));
             return;
         }
     }
@@ -90,7 +90,7 @@ Result<> writeLine(int fd, off_t size, const std::string& line, const std::files
     }
     const int error = written < 0 ? errno : ENOSPC;
     if (::ftruncate(fd, size) != 0) {
-        return cannotWrite(path, "half a line is left in it");
+        return cannotWrite(path, "half a line stays in the file");
     }
     return cannotWrite(path, std::strerror(error));
 }
@@ -118,7 +118,7 @@ Result<> appendEvent(const SystemEvent& event) {
     const std::filesystem::path path = statePath(paths::events);
     const std::string line = renderEvent(event) + "\n";
     if (line.size() > longestLine) {
-        return cannotWrite(path, "it is longer than 64 KiB");
+        return cannotWrite(path, "the event is longer than 64 KiB");
     }
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
@@ -126,7 +126,7 @@ Result<> appendEvent(const SystemEvent& event) {
     off_t size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
     if (size > 0 && static_cast<std::size_t>(size) + line.size() > largestEventFile) {
         rotate(path);
-        fd.reset(); // or the lock of a file that could not be put away would be waited for
+        fd.reset(); // or the lock of a file that could not be renamed would be waited for
         fd = openLocked(path);
         size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
     }

@@ -74,8 +74,8 @@ Result<> makeFile(const std::filesystem::path& path) {
     std::filesystem::create_directories(path.parent_path(), error);
     const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
     if (!fd) {
-        return Error(ErrorNumber::log, "The administrator log " + path.string() +
-                                           " cannot be opened: " + std::strerror(errno) + ".");
+        return Error(ErrorNumber::log, "Cannot open the administrator log " + path.string() + ": " +
+                                           std::strerror(errno) + ".");
     }
     return {};
 }
@@ -146,7 +146,7 @@ Result<> LogDatabase::makeTable() {
     const std::int64_t found = version.number(0);
     version.reset();
     if (found != 0 && found != formVersion) {
-        return Error(ErrorNumber::log, "The administrator log " + path_.string() + " has form " +
+        return Error(ErrorNumber::log, "The administrator log " + path_.string() + " has format " +
                                            std::to_string(found) + ", which this version does not know.");
     }
     if (found == 0 && execute(database_, tableSql) != SQLITE_OK) {

@@ -136,7 +136,7 @@ Result<> SideBySide::add(const std::string& name, const VisibleFolder& visible) 
 
 Result<> SideBySide::finish() {
     if (spoiled_) {
-        return Error(ErrorNumber::daemon, "Cannot take away a share that could not be restricted.");
+        return Error(ErrorNumber::daemon, "Cannot remove a share that could not be restricted.");
     }
     return outcome(mount(nullptr, root_.c_str(), nullptr,
                          MS_REMOUNT | MS_BIND | MS_RDONLY | MS_NOSUID | MS_NODEV, nullptr) == 0,

@@ -15,8 +15,8 @@ using schema::Setting;
 using schema::SettingType;
 
 constexpr const char* header =
-    " settings of this server. The file is written anew whenever the administration changes a\n"
-    "# setting; a change made here by hand takes effect when the service is started the next time.\n";
+    " settings of this server. This file is rewritten whenever a setting is changed. An edit made here\n"
+    "# takes effect when the service starts next.\n";
 
 std::string defaultText(const Setting& setting) {
     return setting.type == SettingType::number ? std::to_string(setting.number) : setting.text;

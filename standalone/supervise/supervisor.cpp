@@ -96,7 +96,8 @@ Result<> Supervisor::takeLock() {
     if (!lock_) {
         return Error("cannot open " + file.string() + ": " + std::strerror(errno));
     }
-    return ::flock(lock_.get(), LOCK_EX | LOCK_NB) == 0 ? Result<>() : Error("another supervisor of it is running");
+    return ::flock(lock_.get(), LOCK_EX | LOCK_NB) == 0 ? Result<>()
+                                                        : Error("another supervisor of it is running");
 }
 
 Result<> Supervisor::startDaemon(Clock::time_point deadline) {
@@ -138,7 +139,7 @@ Result<> Supervisor::handle(const ControlRequest& request) {
     case Command::stop:
         return stop();
     }
-    return Error("the command is unknown");
+    return Error("unknown command");
 }
 
 Result<> Supervisor::replaceDaemon(const DaemonOrder& order) {

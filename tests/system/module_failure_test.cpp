@@ -24,11 +24,11 @@ protected:
 TEST_F(ModuleFailure, saysWhyARangeIsRefused) {
     ASSERT_EQ(setFtp().code, 0);
     expectRefusal(R"({"custom_port_range": true, "custom_port": "40000:30000"})", rangeConflict,
-                  "The range 40000-30000 is upside down.");
+                  "The range 40000-30000 ends before it begins.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "2100:2200"})", rangeConflict,
                   "Port 2121 is taken by the control connections of the FTP service.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "30000:70000"})", rangeConflict,
-                  "The port 70000 is not one from 1 to 65535.");
+                  "Port 70000: expected a port from 1 to 65535.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "30000:30000"})", operationFailed,
                   "The passive port range has only the port 30000; the FTP daemon needs two ports or more.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "900:910"})", operationFailed,
@@ -44,7 +44,7 @@ TEST_F(ModuleFailure, saysWhyAPortIsRefused) {
     expectRefusal(
         R"({"portnum": 55600})", operationFailed,
         "The passive port range 55536 to 55899 contains the FTP port 55600; choose a range without it.");
-    expectRefusal(R"({"portnum": 0})", portConflict, "The port 0 is not one from 1 to 65535.");
+    expectRefusal(R"({"portnum": 0})", portConflict, "Port 0: expected a port from 1 to 65535.");
     expectRefusal(R"({"portnum": 22})", portConflict, "Port 22 is taken by the SFTP service.");
     EXPECT_EQ(getFtp()["portnum"], port);
 }

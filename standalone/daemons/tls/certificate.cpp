@@ -43,7 +43,7 @@ KeyOwner parseKey(const std::string& text) {
 
 Error refuse(const std::filesystem::path& file, const std::string& why) {
     ERR_clear_error();
-    return {ErrorNumber::invalid, "The file " + file.string() + " " + why + "."};
+    return {ErrorNumber::invalid, file.string() + " " + why + "."};
 }
 
 Result<ServerCertificate> load(const Pair& pair) {
@@ -57,18 +57,18 @@ Result<ServerCertificate> load(const Pair& pair) {
     }
     const CertificateOwner certificate = parseCertificate(*certificateText);
     if (!certificate) {
-        return refuse(pair.certificate, "holds no certificate in PEM form");
+        return refuse(pair.certificate, "does not contain a PEM certificate");
     }
     const KeyOwner key = parseKey(*keyText);
     if (!key) {
-        return refuse(pair.key, "holds no private key in PEM form that can be read without a passphrase");
+        return refuse(pair.key, "does not contain a PEM private key without a passphrase");
     }
     const int kind = EVP_PKEY_get_base_id(key.get());
     if (kind != EVP_PKEY_RSA && kind != EVP_PKEY_EC) {
-        return refuse(pair.key, "holds a key that is neither RSA nor of an elliptic curve");
+        return refuse(pair.key, "contains a key that is neither RSA nor an elliptic-curve key");
     }
     if (X509_check_private_key(certificate.get(), key.get()) != 1) {
-        return refuse(pair.key, "does not hold the key of the certificate beside it");
+        return refuse(pair.key, "is not the key of the certificate next to it");
     }
     return ServerCertificate{pair.certificate, pair.key, kind == EVP_PKEY_RSA,
                              sha256(*certificateText + *keyText), nullptr};

@@ -79,10 +79,9 @@ TEST_F(HostRows, EveryWrongFieldIsNamed) {
     for (const Json::Value& each : problem["errors"]) {
         errors[each["field"].asString()] = each["expected"].asString();
     }
-    const std::map<std::string, std::string> expected{
-        {"enable_ftp", "true or false"},
-        {"timeout", "an integer from 0 to 2147483647"},
-        {"utf8_mode", "an integer from 0 to 2"}};
+    const std::map<std::string, std::string> expected{{"enable_ftp", "true or false"},
+                                                      {"timeout", "an integer from 0 to 2147483647"},
+                                                      {"utf8_mode", "an integer from 0 to 2"}};
     EXPECT_EQ(errors, expected);
 }
 
@@ -126,12 +125,12 @@ TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
 
 TEST_F(HostRows, APortThatNobodyHoldsIsRefusedInThePlatformsWords) {
     platform.takenPorts["ssh"] = {0};
-    access.sentence = "The port 0 is not one from 1 to 65535.";
+    access.sentence = "Port 0: expected a port from 1 to 65535.";
     const Answer answer = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":0})");
     EXPECT_EQ(answer.status, 409);
     EXPECT_FALSE(answer.json().isMember("holder"));
     EXPECT_EQ(answer.json()["detail"],
-              "Port conflict. The port 0 is not one from 1 to 65535. Nothing was changed.");
+              "Port conflict. Port 0: expected a port from 1 to 65535. Nothing was changed.");
 }
 
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {

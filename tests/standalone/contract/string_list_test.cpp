@@ -78,7 +78,7 @@ TEST(StringList, TakesACapacityOfNothingOrLess) {
 TEST(StringList, RefusesWhatIsNotThere) {
     List list(VLIBCSzListAlloc(1));
     EXPECT_LT(push(list, nullptr), 0);
-    EXPECT_EQ(velt::lastErrorSentence(), "There is no list or no text to add to it.");
+    EXPECT_EQ(velt::lastErrorSentence(), "A list and a text to add to it are required.");
     EXPECT_EQ(list->count, 0);
     VLIBCSzList* none = nullptr;
     EXPECT_LT(VLIBCSzListPush(&none, "x"), 0);

@@ -33,7 +33,7 @@ TEST(StringMap, RefusesWhatIsNotThere) {
     EXPECT_LT(VLIBCSzHashSetValue(&map, nullptr, "v"), 0);
     EXPECT_LT(VLIBCSzHashSetValue(&map, "k", nullptr), 0);
     EXPECT_LT(VLIBCSzHashSetValue(nullptr, "k", "v"), 0);
-    EXPECT_EQ(velt::lastErrorSentence(), "There is no map, no key or no value to set in it.");
+    EXPECT_EQ(velt::lastErrorSentence(), "A map, a key and a value are required.");
     EXPECT_TRUE(map->entries.empty());
     VLIBCSzHashFree(map);
     VLIBCSzHashFree(nullptr);

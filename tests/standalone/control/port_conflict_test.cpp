@@ -79,7 +79,7 @@ TEST_F(PortConflictTest, PortsOutsideTheirRangeConflict) {
             EXPECT_NE(IsPortConflict(service, port, port), 0) << port;
             EXPECT_EQ(lastPortConflict().holder, "");
             EXPECT_EQ(lastErrorSentence(),
-                      "The port " + std::to_string(port) + " is not one from 1 to 65535.");
+                      "Port " + std::to_string(port) + ": expected a port from 1 to 65535.");
         }
         EXPECT_NE(IsPortConflict(service, 40000, 65536), 0);
         EXPECT_NE(IsPortConflict(service, 0, 40000), 0);
@@ -89,7 +89,7 @@ TEST_F(PortConflictTest, PortsOutsideTheirRangeConflict) {
 
 TEST_F(PortConflictTest, ARangeUpsideDownConflicts) {
     EXPECT_NE(IsPortConflict("ftp", 40010, 40000), 0);
-    EXPECT_EQ(lastErrorSentence(), "The range 40010-40000 is upside down.");
+    EXPECT_EQ(lastErrorSentence(), "The range 40010-40000 ends before it begins.");
 }
 
 TEST_F(PortConflictTest, FreePortsAreNoConflict) {

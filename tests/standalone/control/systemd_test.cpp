@@ -190,7 +190,7 @@ TEST_F(SystemdTest, AnAnswerIsNotTakenForADaemon) {
     answerWith("exit 0\n"); // as in a changed root, where systemctl ignores all requests
     const std::string refusal = messageOf(sftp_->start(testOrder(port_, "one")));
     EXPECT_EQ(refusal,
-              "The SFTP daemon does not start: systemd says that it has started it, but it does not serve.");
+              "The SFTP daemon does not start: systemd reports a start, but the daemon does not serve.");
 }
 
 TEST_F(SystemdTest, AStartIsOverWithinFiveSeconds) {
@@ -198,7 +198,7 @@ TEST_F(SystemdTest, AStartIsOverWithinFiveSeconds) {
     const auto began = std::chrono::steady_clock::now();
     const std::string refusal = messageOf(sftp_->start(testOrder(port_, "one")));
     EXPECT_LT(std::chrono::steady_clock::now() - began, milliseconds(5500));
-    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor does not report in time.");
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor did not report in time.");
 }
 
 TEST_F(SystemdTest, WhatWasNeverStartedIsStoppedWithoutACall) {

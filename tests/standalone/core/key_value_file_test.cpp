@@ -117,7 +117,7 @@ TEST_F(KeyValueFile, RefusesAValueThatWouldNotStayInItsLine) {
 TEST_F(KeyValueFile, RefusesAKeyThatIsNone) {
     for (const char* key : {"", "a b", "a=b", "#a", "a\n", "\"a\"", "[a]", "\xc3\xa9"}) {
         EXPECT_EQ(test::messageOf(writeKeyValue(file_, key, "x")),
-                  "A key has letters, digits, \"_\", \"-\" and \".\" only, and at least one.")
+                  "Expected a key of letters, digits, \"_\", \"-\" and \".\".")
             << key;
     }
     EXPECT_FALSE(std::filesystem::exists(file_));

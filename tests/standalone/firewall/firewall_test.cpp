@@ -351,8 +351,8 @@ TEST_F(FirewallTest, WithoutTheRightsTheErrorSaysSo) {
     EXPECT_EQ(withoutRights([] {
                   const bool refused = VELTFwRuleHup() < 0;
                   return refused && lastErrorSentence() ==
-                                        "The firewall rules are not loaded: this process may not "
-                                        "administer the network."
+                                        "Cannot load the firewall rules: this process is not "
+                                        "allowed to change the firewall."
                              ? 7
                              : 1;
               }),

@@ -95,7 +95,7 @@ TEST_F(FirewallSettingsFile, IsReadAsWritten) {
 
 TEST_F(FirewallSettingsFile, ThatIsDamagedIsNamedWithItsLine) {
     const std::string portsExpected =
-        "ports: expected ports and ranges of ports with blanks between them, such as 22 8000-8010";
+        "ports: expected ports and port ranges separated by spaces, such as 22 8000-8010";
     const std::pair<const char*, std::string> damaged[] = {
         {"", ": missing key \"version\""},
         {"mode = drop\n", ": missing key \"version\""},

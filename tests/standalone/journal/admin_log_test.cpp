@@ -212,7 +212,7 @@ TEST_F(AdminLogTest, AFormFromTheFutureIsLeftAlone) {
     logUser("elsewhere");
     setStateRoot(folder_.path());
     const std::string refused = test::messageOf(queryLog({}));
-    EXPECT_NE(refused.find("has form 2"), std::string::npos) << refused;
+    EXPECT_NE(refused.find("has format 2"), std::string::npos) << refused;
 }
 
 TEST_F(AdminLogTest, StartsAnewWhenTheFileWasMovedAway) {

@@ -9,8 +9,8 @@ namespace velt {
 namespace {
 
 constexpr const char* goldenFtp =
-    R"(# FTP settings of this server. The file is written anew whenever the administration changes a
-# setting; a change made here by hand takes effect when the service is started the next time.
+    R"(# FTP settings of this server. This file is rewritten whenever a setting is changed. An edit made here
+# takes effect when the service starts next.
 version = 1
 
 # Services that run: 1 is FTP, 2 is FTPS, 3 is both (any number, default 0).
@@ -78,8 +78,8 @@ umask = 1
 )";
 
 constexpr const char* goldenSftp =
-    R"(# SFTP settings of this server. The file is written anew whenever the administration changes a
-# setting; a change made here by hand takes effect when the service is started the next time.
+    R"(# SFTP settings of this server. This file is rewritten whenever a setting is changed. An edit made here
+# takes effect when the service starts next.
 version = 1
 
 # SFTP runs (0 or 1, default 0).

@@ -111,10 +111,10 @@ TEST_F(SupervisorTest, ASupervisorThatDoesNotReportIsToldFromOneThatEnded) {
     };
     useScript("exit 0");
     std::string refusal = messageOf(sftp_.start(testOrder(port_, "one")));
-    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor ended without a reason.");
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor ended without giving a reason.");
     useScript("sleep 5.5 &");
     refusal = messageOf(sftp_.start(testOrder(port_, "one")));
-    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor does not report in time.");
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor did not report in time.");
     ::setenv("VELT_LIBEXEC_DIR", built.c_str(), 1);
 }
 

@@ -64,7 +64,7 @@ TEST_F(FtpCandidate, isRefusedForACertificateThatIsNone) {
     EXPECT_EQ(messageOf(testFtpCandidate(settings)), "") << "without FTPS nobody asks for it";
     settings.record.service_flags = VELT_FTP_SERVICE_TLS;
     const std::string refusal = messageOf(testFtpCandidate(settings));
-    EXPECT_NE(refusal.find("server.crt holds no certificate"), std::string::npos) << refusal;
+    EXPECT_NE(refusal.find("server.crt does not contain a PEM certificate"), std::string::npos) << refusal;
 }
 
 TEST_F(FtpCandidate, isRefusedBelowARootThatTheConfigurationCannotName) {

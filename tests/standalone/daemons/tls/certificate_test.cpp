@@ -126,11 +126,11 @@ TEST_F(ServerCertificates, ofTheAdministratorAreNeverReplacedByOwnOnes) {
     root_.write("etc/velt/tls/server.crt", makeSelfSigned({"given", {}})->certificate);
     expectRefusal("server.key cannot be read");
     root_.write("etc/velt/tls/server.key", "nonsense");
-    expectRefusal("server.key holds no private key");
+    expectRefusal("server.key does not contain a PEM private key");
     root_.write("etc/velt/tls/server.key", makeSelfSigned({"other", {}})->key);
-    expectRefusal("server.key does not hold the key of the certificate");
+    expectRefusal("server.key is not the key of the certificate");
     root_.write("etc/velt/tls/server.crt", "nonsense");
-    expectRefusal("server.crt holds no certificate");
+    expectRefusal("server.crt does not contain a PEM certificate");
 }
 
 TEST_F(ServerCertificates, withAKeyThatAsksForAPassphraseAreRefused) {
