@@ -159,8 +159,7 @@ struct SettingGroup {
 };
 
 inline constexpr SettingGroup ftp{"ftp", "VELT.Core.FileServ.FTP", 3, ftpSettings};
-inline constexpr SettingGroup security{"security", "VELT.Core.FileServ.FTP.Security", 1,
-                                       securitySettings};
+inline constexpr SettingGroup security{"security", "VELT.Core.FileServ.FTP.Security", 1, securitySettings};
 inline constexpr SettingGroup sftp{"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, sftpSettings};
 
 } // namespace velt::schema

@@ -216,8 +216,7 @@ TEST(Config, AnOptionThatIsWrongIsNamed) {
 }
 
 TEST(Config, AKeyThatIsWrongIsNamed) {
-    EXPECT_EQ(refusal({"--config", "/nowhere"}),
-              "Cannot read /nowhere: No such file or directory.");
+    EXPECT_EQ(refusal({"--config", "/nowhere"}), "Cannot read /nowhere: No such file or directory.");
     EXPECT_EQ(refusal({"--config", "/tmp"}), "Cannot read /tmp: Is a directory.");
     EXPECT_TRUE(refusalOfFile("listen = x").starts_with(" is not a JSON object: line 1, column 1"));
     EXPECT_TRUE(refusalOfFile("[]").starts_with(" is not a JSON object: line 1, column 1"));

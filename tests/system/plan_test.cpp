@@ -102,8 +102,8 @@ TEST_F(FtpPlan, isRefusedWhereSessionsCannotHaveMountsOfTheirOwn) {
         rights[0].effective &= ~(1U << CAP_SYS_ADMIN);
         syscall(SYS_capset, &header, rights.data());
         const bool told = messageOf(planFtpDaemon()) ==
-                          "The FTP service cannot confine its sessions here: mounts of "
-                          "their own are not possible (Operation not permitted).";
+                          "FTP sessions cannot be confined here: cannot make a mount namespace: "
+                          "Operation not permitted.";
         _exit(told ? 0 : 1);
     }
     int status = -1;

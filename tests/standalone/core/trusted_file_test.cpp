@@ -35,7 +35,8 @@ TEST_F(TrustedFile, isReadAsAWhole) {
 TEST_F(TrustedFile, isNoneThatOthersMayWrite) {
     for (const mode_t mode : {0620U, 0602U, 0666U}) {
         const auto refused = messageOf(readTrusted(fileWithMode(mode)));
-        EXPECT_NE(refused.find("others may write it"), std::string::npos) << mode << ": " << refused;
+        EXPECT_NE(refused.find("other accounts may write to it"), std::string::npos)
+            << mode << ": " << refused;
     }
 }
 

@@ -89,7 +89,8 @@ TEST(RunProcess, PassesNoOtherDescriptorAndNoSignalChoice) {
     ::signal(SIGPIPE, old);
     ::close(stray);
     EXPECT_EQ(descriptors.output, "0\n1\n2\n3\n") << "3 is the folder that ls reads";
-    // Some versions of the C library have two signals of their own (32 and 33) ignored in whatever they spawn.
+    // Some versions of the C library have two signals of their own (32 and 33) ignored in whatever they
+    // spawn.
     ASSERT_EQ(ignored.output.size(), 17U) << ignored.output;
     EXPECT_EQ(std::stoull(ignored.output, nullptr, 16) & ~0x180000000ULL, 0U) << ignored.output;
 }

@@ -157,7 +157,7 @@ TEST_F(ServerCertificates, mayHaveAnRsaKey) {
                           "-keyout", key, "-out", certificate})
                   .exitCode,
               0);
-    expectRefusal("neither RSA nor of an elliptic curve");
+    expectRefusal("neither RSA nor an elliptic-curve key");
 }
 
 } // namespace
