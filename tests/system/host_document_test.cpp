@@ -65,12 +65,12 @@ TEST_F(HostDocument, bringsBackEverySetting) {
 TEST_F(HostDocument, aRefusedSectionIsNamedWithThoseThatWereApplied) {
     Json::Value document = jsonOf(exported());
     document["security"]["anonymous"] = true;
-    document["ftp"]["timeout"] = -5;
+    document["ftp"]["ext_ip"] = "gateway";
     document["sftp"]["portnum"] = 2233;
     const ProcessResult result = veltctl({"import", "-"}, textOf(document));
     EXPECT_EQ(result.exitCode, 5);
     for (const char* text :
-         {"The FTP time-out is -5 seconds", "ftp: failed", "security: applied", "sftp: not applied"}) {
+         {"The external address is \"gateway\"", "ftp: failed", "security: applied", "sftp: not applied"}) {
         EXPECT_TRUE(contains(result.errors, text)) << result.errors;
     }
     const Json::Value now = jsonOf(exported());
