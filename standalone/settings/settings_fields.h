@@ -24,7 +24,7 @@ template<class Settings> struct StoredSetting {
 
 /// One kind of settings file.
 template<class Settings> struct SettingsFile {
-    const char* services; ///< whose settings they are: "FTP", "SFTP"
+    const char* services = ""; ///< whose settings they are: "FTP", "SFTP"
     std::vector<StoredSetting<Settings>> settings;
     int version = 1; ///< the newest in which a key came
 };

@@ -27,8 +27,7 @@ protected:
     }
 };
 
-void expectVersionOne(const FtpSettings& settings) {
-    const auto& record = settings.record;
+void expectTransfersOfVersionOne(const _tag_VELT_FTP_CONF_& record) {
     EXPECT_STREQ(record.portnum, "2121");
     EXPECT_EQ(record.service_flags, 3);
     EXPECT_EQ(record.passive_port_min, 50000);
@@ -39,6 +38,11 @@ void expectVersionOne(const FtpSettings& settings) {
     EXPECT_EQ(record.maxdownloadrate, -1);
     EXPECT_EQ(record.max_conn_per_ip, 5);
     EXPECT_EQ(record.enable_fxp, 1);
+}
+
+void expectVersionOne(const FtpSettings& settings) {
+    const auto& record = settings.record;
+    expectTransfersOfVersionOne(record);
     EXPECT_EQ(record.support_utf8, 1);
     EXPECT_FALSE(settings.useUtf8);
     EXPECT_TRUE(settings.fipsOnly);
