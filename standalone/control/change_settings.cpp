@@ -2,7 +2,6 @@
 
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -14,25 +13,17 @@ namespace velt {
 
 namespace {
 
-// The daemon's test needs what the daemon needs: its program, its account, shares that can be read. Settings
-// that switch a service off, or are changed while it is off, must not fail for the want of these; switching
-// it on tests them all.
-Result<> testIfOn(const FtpSettings& settings) {
-    return enablesFtp(settings.record) ? testFtpCandidate(settings) : Result<>();
-}
-
-Result<> testIfOn(const SftpSettings& settings) {
-    return settings.enabled ? testSftpCandidate(settings) : Result<>();
-}
-
+// The daemon's own test needs what the daemon needs: its program, its account, shares that can be read. While
+// the service is off, or is being switched off, settings can be changed without these; switching it on tests
+// them all.
 Result<> check(const FtpSettings& settings) {
     const Result<> checked = checkFtpSettings(settings);
-    return checked ? testIfOn(settings) : checked;
+    return checked && enablesFtp(settings.record) ? testFtpCandidate(settings) : checked;
 }
 
 Result<> check(const SftpSettings& settings) {
     const Result<> checked = checkSftpSettings(settings);
-    return checked ? testIfOn(settings) : checked;
+    return checked && settings.enabled ? testSftpCandidate(settings) : checked;
 }
 
 template<class Settings>
