@@ -45,7 +45,9 @@ Result<pid_t> Spawn::start(const std::vector<std::string>& arguments) {
     char* environment[] = {path, language, nullptr};
     pid_t pid = -1;
     const int error = ::posix_spawn(&pid, pointers[0], &actions_, &attributes_, pointers.data(), environment);
-    return error == 0 ? Result(pid) : cannot("start", arguments[0], error);
+    if (error != 0)
+        return cannot("start", arguments[0], error);
+    return pid;
 }
 
 } // namespace velt

@@ -257,7 +257,7 @@ Result<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
         entry.address = query.text(11);
     }
     Result<std::vector<LogEntry>> outcome =
-        result == SQLITE_DONE ? Result(std::move(entries)) : cannotBe("read");
+        result == SQLITE_DONE ? Result<std::vector<LogEntry>>(std::move(entries)) : cannotBe("read");
     query.reset();
     return outcome;
 }
