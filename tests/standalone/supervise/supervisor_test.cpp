@@ -156,7 +156,7 @@ TEST_F(SupervisorTest, AKilledDaemonIsUpAgainWithinTwoSeconds) {
     EXPECT_EQ(daemonState(sftpDaemon).restarts, 0U);
     const auto began = Clock::now();
     kill(daemon);
-    EXPECT_TRUE(waitUntil([this] { return isServing(daemonState(sftpDaemon)); }, seconds(2)));
+    EXPECT_TRUE(waitUntil([] { return isServing(daemonState(sftpDaemon)); }, seconds(2)));
     RecordProperty("milliseconds", static_cast<int>((Clock::now() - began) / milliseconds(1)));
     EXPECT_NE(daemonState(sftpDaemon).daemon, daemon);
     EXPECT_TRUE(accepts(port_));
@@ -316,7 +316,7 @@ TEST_F(SupervisorTest, ItSurvivesTheEndOfTheProcessThatStartedIt) {
     ASSERT_EQ(status, 0);
     EXPECT_TRUE(isServing(daemonState(sftpDaemon)));
     kill(daemonState(sftpDaemon).daemon);
-    EXPECT_TRUE(waitUntil([this] { return isServing(daemonState(sftpDaemon)); }, seconds(2)));
+    EXPECT_TRUE(waitUntil([] { return isServing(daemonState(sftpDaemon)); }, seconds(2)));
 }
 
 TEST_F(SupervisorTest, ASupervisorThatIsAskedToEndTakesItsDaemonAlong) {
