@@ -41,7 +41,7 @@ std::string quoted(const std::string& text) {
 
 std::string provideToken(VeltdClient& client) {
     if (const auto stored = valueOf(readOptionalFile(tokenName))) {
-        const std::string token = stored->substr(0, stored->find('\n'));
+        std::string token = stored->substr(0, stored->find('\n'));
         client.setToken(token);
         if (!token.empty() && client.get("/healthz").good()) {
             return token;

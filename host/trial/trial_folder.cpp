@@ -23,7 +23,7 @@ std::string systemError() {
     return std::generic_category().message(errno);
 }
 
-std::string withSlash(std::string name) {
+std::string withSlash(const std::string& name) {
     return name.ends_with('/') ? name : name + "/";
 }
 

@@ -8,6 +8,7 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cstring>
 #include <string_view>
 
@@ -47,7 +48,9 @@ Reply parseReply(const std::string& text) {
         return {};
     }
     const auto body = parseObject(std::string_view(text).substr(head + 4));
-    return {std::atoi(text.c_str() + version.size()), body ? *body : Json::Value()};
+    int status = 0;
+    std::from_chars(text.data() + version.size(), text.data() + head, status);
+    return {status, body ? *body : Json::Value()};
 }
 
 } // namespace

@@ -27,7 +27,7 @@ Result<> readRecord(_tag_VELT_SFTP_CONFIG_& record) {
 }
 
 Result<> storeSettings(const SftpSettings& wanted) {
-    const Result<> result = changeSftpSettings(
+    Result<> result = changeSftpSettings(
         [&wanted](SftpSettings& settings) { settings = lastSeenSettings().merge(settings, wanted); });
     // Not what was stored in the end: the caller goes on with its own copy.
     if (result)

@@ -84,7 +84,7 @@ Result<> ChildLauncher::launch(const std::filesystem::path& folder, const Daemon
     std::vector<std::string> arguments{installedFile("velt-supervise").string(), folder.string(), daemon_,
                                        order.configurationHash, joinPorts(order.ports)};
     arguments.insert(arguments.end(), order.arguments.begin(), order.arguments.end());
-    if (const auto spawned = spawnDetached(arguments, writeEnd.get()); !spawned) {
+    if (auto spawned = spawnDetached(arguments, writeEnd.get()); !spawned) {
         return spawned;
     }
     writeEnd.reset();

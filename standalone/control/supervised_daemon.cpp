@@ -64,7 +64,7 @@ Result<> SupervisedDaemon::start(const DaemonOrder& order) {
     if (supervised && isServing(now) && now.configurationHash == order.configurationHash) {
         return {};
     }
-    if (const auto free = probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0); !free) {
+    if (auto free = probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0); !free) {
         return free;
     }
     const auto started =

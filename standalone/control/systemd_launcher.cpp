@@ -35,10 +35,10 @@ SystemdLauncher::SystemdLauncher(const Daemon& daemon, SystemdPlaces places)
     : daemon_(daemon), unit_(unitName(daemon)), places_(std::move(places)) {}
 
 Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
-    if (const auto kept = keep(folder, order); !kept) {
+    if (auto kept = keep(folder, order); !kept) {
         return kept;
     }
-    if (const auto written = writeUnits(folder); !written) {
+    if (auto written = writeUnits(folder); !written) {
         return written;
     }
     // Not "start": after a killed supervisor systemd may be waiting to start it again, and a daemon of the

@@ -12,7 +12,7 @@ Result<> announce(const std::string& name, const std::map<std::string, std::stri
     const SystemEvent event{now, name, parameters, requestActor().actor, requestActor().address};
     return perform(Effect::event, name, [&event] {
         // It has happened, whether the file can take it or not.
-        const Result<> written = appendEvent(event);
+        Result<> written = appendEvent(event);
         publish(event);
         return written;
     });

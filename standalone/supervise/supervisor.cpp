@@ -62,7 +62,7 @@ Supervisor::Supervisor(std::filesystem::path folder, std::string name)
 
 Result<> Supervisor::begin(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;
-    if (const auto locked = takeLock(); !locked) {
+    if (auto locked = takeLock(); !locked) {
         return locked;
     }
     ::prctl(PR_SET_CHILD_SUBREAPER, 1);
@@ -149,7 +149,7 @@ Result<> Supervisor::replaceDaemon(const DaemonOrder& order) {
     if (unchanged) {
         return {};
     }
-    if (const auto ended = endDaemon(); !ended) {
+    if (auto ended = endDaemon(); !ended) {
         return ended;
     }
     order_ = order;

@@ -23,7 +23,7 @@ Result<> testRendering(const FtpSettings& settings, ProftpdPlaces places) {
     }
     places.runFolder = scratch->path();
     const auto configuration = scratch->path() / "proftpd.conf";
-    if (const auto written = replaceFile(configuration, renderProftpd(settings, places), 0600); !written) {
+    if (auto written = replaceFile(configuration, renderProftpd(settings, places), 0600); !written) {
         return written;
     }
     return runConfigurationTest("FTP", {program, "-t", "-c", configuration.string()});
@@ -59,11 +59,11 @@ std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
 
 Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
     for (const auto& folder : {places.runFolder, places.loginRoot, places.anonymousShare.parent_path()}) {
-        if (const auto made = makeFolder(folder); !made) {
+        if (auto made = makeFolder(folder); !made) {
             return made;
         }
     }
-    if (const auto rules = makeRulesFile(); !rules) {
+    if (auto rules = makeRulesFile(); !rules) {
         return rules;
     }
     return confinesAnonymous(settings)

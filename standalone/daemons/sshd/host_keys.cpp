@@ -64,7 +64,7 @@ Result<> makeMissing(const std::vector<std::filesystem::path>& keys) {
         if (isThere(keys[i])) {
             continue;
         }
-        if (const auto made = makeKey(std::string(kinds[i]), keys[i]); !made) {
+        if (auto made = makeKey(std::string(kinds[i]), keys[i]); !made) {
             return made;
         }
     }

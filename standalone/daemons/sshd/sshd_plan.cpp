@@ -66,7 +66,7 @@ Result<> testRendering(const std::string& text) {
         return scratch.error();
     }
     const auto configuration = scratch->path() / "sshd_config";
-    if (const auto written = replaceFile(configuration, text, 0600); !written) {
+    if (auto written = replaceFile(configuration, text, 0600); !written) {
         return written;
     }
     return runConfigurationTest("SFTP", {program, "-t", "-f", configuration.string()});
