@@ -1,8 +1,8 @@
 // A store interrupted at each of its system calls: the linker puts the functions below in the place of the
 // calls.
 #include "base/file.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <fcntl.h>
 #include <gtest/gtest.h>

@@ -1,32 +1,15 @@
 #include "platform/sftp.h"
 #include "platform/webapi.h"
 #include "tests/contract/contract_test.h"
-
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
+#include "tests/support/ports.h"
 
 #include <cstdio>
 
 namespace contract {
 namespace {
 
+using velt::test::freePort;
 using WebUtils::IsPortConflict;
-
-constexpr int ftpPort = 2121;
-constexpr int sftpPort = 2222;
-
-/// A port on which nobody listens.
-int freePort() {
-    const int socket = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    socklen_t size = sizeof address;
-    auto* const generic = reinterpret_cast<sockaddr*>(&address);
-    const bool found = ::bind(socket, generic, size) == 0 && ::getsockname(socket, generic, &size) == 0;
-    ::close(socket);
-    return found ? ntohs(address.sin_port) : 0;
-}
 
 class PortContract : public ContractTest {
 protected:
@@ -34,22 +17,27 @@ protected:
         ContractTest::SetUp();
         auto record = ftpRecord();
         std::snprintf(record.portnum, sizeof record.portnum, "%d", ftpPort);
-        record.passive_port_min = 30000;
-        record.passive_port_max = 30010;
+        record.passive_port_min = firstPassive;
+        record.passive_port_max = lastPassive;
         ASSERT_GE(VELTFTPConfSet(record), 0) << lastError();
         ASSERT_GE(VELTSFTPConfigSet(0, sftpPort), 0) << lastError();
     }
+
+    const int ftpPort = freePort();
+    const int sftpPort = freePort();
+    const int firstPassive = velt::test::freePorts(11);
+    const int lastPassive = firstPassive + 10;
 };
 
 TEST_F(PortContract, AServicesOwnPortsAreNoConflict) {
     EXPECT_EQ(IsPortConflict("ftp", ftpPort, ftpPort), 0);
-    EXPECT_EQ(IsPortConflict("ftp", 30000, 30010), 0);
+    EXPECT_EQ(IsPortConflict("ftp", firstPassive, lastPassive), 0);
     EXPECT_EQ(IsPortConflict("ssh", sftpPort, sftpPort), 0);
 }
 
 TEST_F(PortContract, TheOtherServicesPortsAre) {
     EXPECT_NE(IsPortConflict("ssh", ftpPort, ftpPort), 0);
-    EXPECT_NE(IsPortConflict("ssh", 30005, 30005), 0);
+    EXPECT_NE(IsPortConflict("ssh", firstPassive + 5, firstPassive + 5), 0);
     EXPECT_NE(IsPortConflict("ftp", sftpPort, sftpPort), 0);
 }
 

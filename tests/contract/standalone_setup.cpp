@@ -7,7 +7,7 @@
 #include "standalone/shares/share_store.h"
 #include "standalone/standalone.h"
 #include "tests/contract/platform_setup.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <sys/stat.h>
 #include <unistd.h>

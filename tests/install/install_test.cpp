@@ -1,6 +1,6 @@
 // An installation below a prefix of its own: what is there, and that it works there.
 #include "standalone/process/run_program.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -2,7 +2,9 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/core/last_error.h"
+#include "tests/support/files.h"
 #include "tests/support/result.h"
+#include "tests/support/text.h"
 #include "tests/system/support/running_program.h"
 
 #include <filesystem>
@@ -10,10 +12,6 @@
 namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 std::string namesIn(FtpSession& session) {
     return session.receive("NLST").value_or("(refused)");
@@ -61,8 +59,7 @@ TEST_F(FtpService, unconfinedUsersSeeTheOfferedSharesSideBySide) {
     EXPECT_EQ(session.receive("RETR /odd \"name\" #%{env:HOME} ä/file"), "odd");
     EXPECT_EQ(session.send("STOR /music/new", "x"), 226);
     EXPECT_EQ(session.command("MKD /made").code, 550) << "nobody writes beside the shares";
-    EXPECT_FALSE(contains(readFileText("/proc/self/mounts"), "velt-shares"))
-        << "the server's own mounts stay";
+    EXPECT_FALSE(contains(contentsOf("/proc/self/mounts"), "velt-shares")) << "the server's own mounts stay";
 }
 
 TEST_F(FtpService, aShareThatStartsWithDotsIsShown) {
@@ -130,7 +127,7 @@ TEST_F(FtpService, anonymousUsersWriteWhereThatIsGranted) {
     FtpSession session(port);
     ASSERT_EQ(session.logIn("anonymous", "a@b"), 230);
     EXPECT_EQ(session.send("STOR new", "x"), 226);
-    EXPECT_EQ(readFileText(folder / "new"), "x");
+    EXPECT_EQ(contentsOf(folder / "new"), "x");
 }
 
 TEST_F(FtpService, anonymousUsersAreRefusedWithoutTheirShare) {

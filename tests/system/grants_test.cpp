@@ -1,4 +1,5 @@
 // What the shares grant, held against everything that a client can try.
+#include "tests/support/files.h"
 #include "tests/system/support/shared_folders.h"
 
 #include <thread>
@@ -60,7 +61,7 @@ TEST_F(ShareGrants, leaveNothingToBeChangedInAShareForReading) {
     }
     session.command("RNFR /ro/file");
     EXPECT_GE(session.command("RNTO /ro/other").code, 500);
-    EXPECT_EQ(readFileText(folder / "file"), "ro");
+    EXPECT_EQ(contentsOf(folder / "file"), "ro");
     EXPECT_EQ(modeOf(folder / "file"), 0666U);
     EXPECT_EQ(std::distance(fs::directory_iterator(folder), {}), 2);
     EXPECT_TRUE(fs::is_empty(folder / "sub"));
@@ -74,14 +75,14 @@ TEST_F(ShareGrants, letAWriterDoAllOfThat) {
     ASSERT_EQ(session.logIn("alice"), 230);
     EXPECT_EQ(session.send("STOR /rw/new", "one"), 226);
     EXPECT_EQ(session.send("APPE /rw/new", "two"), 226);
-    EXPECT_EQ(readFileText(folder / "new"), "onetwo");
+    EXPECT_EQ(contentsOf(folder / "new"), "onetwo");
     EXPECT_EQ(session.command("SITE CHMOD 600 /rw/new").code, 200);
     EXPECT_EQ(modeOf(folder / "new"), 0600U);
     EXPECT_EQ(session.command("MFMT 20200101000000 /rw/new").code, 213);
     EXPECT_EQ(session.command("MKD /rw/made").code, 257);
     EXPECT_EQ(session.command("RNFR /rw/new").code, 350);
     EXPECT_EQ(session.command("RNTO /rw/made/moved").code, 250);
-    EXPECT_EQ(readFileText(folder / "made/moved"), "onetwo");
+    EXPECT_EQ(contentsOf(folder / "made/moved"), "onetwo");
     EXPECT_EQ(session.command("DELE /rw/made/moved").code, 250);
     EXPECT_EQ(session.command("RMD /rw/made").code, 250);
 }
@@ -95,14 +96,14 @@ TEST_F(ShareGrants, holdWhenFilesAreMovedBetweenShares) {
     ASSERT_EQ(session.logIn("alice"), 230);
     session.command("RNFR /rw/file");
     EXPECT_GE(session.command("RNTO /ro/stolen").code, 500);
-    EXPECT_EQ(readFileText(writable / "file"), "rw");
+    EXPECT_EQ(contentsOf(writable / "file"), "rw");
     EXPECT_FALSE(fs::exists(readable / "stolen"));
     session.command("RNFR /ro/file");
     session.command("RNTO /rw/taken");
-    EXPECT_EQ(readFileText(readable / "file"), "ro") << "a copy at most";
+    EXPECT_EQ(contentsOf(readable / "file"), "ro") << "a copy at most";
     EXPECT_EQ(session.command("RNFR /rw/file").code, 350);
     EXPECT_EQ(session.command("RNTO /rw2/moved").code, 250);
-    EXPECT_EQ(readFileText("/mnt/srv/rw2/moved"), "rw");
+    EXPECT_EQ(contentsOf("/mnt/srv/rw2/moved"), "rw");
     EXPECT_FALSE(fs::exists(writable / "file"));
 }
 
@@ -126,8 +127,8 @@ TEST_F(ShareGrants, holdThroughSymbolicLinks) {
     }
     EXPECT_EQ(session.receive("RETR /rw/within"), "ro") << "what she may read anyway";
     EXPECT_EQ(session.send("STOR /rw/within", "x"), 550);
-    EXPECT_EQ(readFileText("/mnt/srv/ro/file"), "ro");
-    EXPECT_EQ(readFileText("/mnt/srv/no/file"), "no");
+    EXPECT_EQ(contentsOf("/mnt/srv/ro/file"), "ro");
+    EXPECT_EQ(contentsOf("/mnt/srv/no/file"), "no");
 }
 
 TEST_F(ShareGrants, holdBetweenTwoServers) {
@@ -150,7 +151,7 @@ TEST_F(ShareGrants, holdBetweenTwoServers) {
     receiver.join();
     EXPECT_EQ(from.read().code, 226);
     EXPECT_EQ(to.read().code, 226);
-    EXPECT_EQ(readFileText("/mnt/srv/rw/copy"), "ro");
+    EXPECT_EQ(contentsOf("/mnt/srv/rw/copy"), "ro");
 }
 
 TEST_F(ShareGrants, ofAUserComeBeforeThoseOfGroups) {
@@ -258,7 +259,7 @@ TEST_F(ShareGrants, areReadFromAFileThatWasEditedByHand) {
     share("data", {{"alice", write}});
     start();
     const fs::path file = worldRoot / "etc/velt/shares.json";
-    std::string text = readFileText(file);
+    std::string text = contentsOf(file);
     text.replace(text.find("\"write\""), 7, "\"read\"");
     writeFile(file, text);
     EXPECT_EQ(accessOf("alice", "/data"), "read");
@@ -269,7 +270,7 @@ TEST_F(ShareGrants, refuseEveryLoginWhenTheirFileCannotBeTrusted) {
     letAnonymousIn();
     start();
     const fs::path file = worldRoot / "etc/velt/shares.json";
-    const std::string text = readFileText(file);
+    const std::string text = contentsOf(file);
     const auto expectRefused = [&](const char* why) {
         EXPECT_EQ(seenBy("alice"), "530") << why;
         EXPECT_EQ(FtpSession(port).logIn("anonymous", "a@b"), 530) << why;
@@ -317,18 +318,18 @@ TEST_F(ShareGrants, holdForRealClients) {
     };
     EXPECT_EQ(lftp("cls -1 /").output, "/ro/\n/rw/\n");
     EXPECT_EQ(lftp("set ftp:ssl-force yes; put /mnt/srv/upload-this -o /rw/sent").exitCode, 0);
-    EXPECT_EQ(readFileText("/mnt/srv/rw/sent"), "sent");
+    EXPECT_EQ(contentsOf("/mnt/srv/rw/sent"), "sent");
     EXPECT_NE(lftp("set ftp:ssl-force yes; put /mnt/srv/upload-this -o /ro/sent").exitCode, 0);
     EXPECT_NE(lftp("rm /ro/file").exitCode, 0);
     EXPECT_NE(lftp("mv /ro/file /ro/other").exitCode, 0);
     EXPECT_EQ(lftp("mirror -R --delete /mnt/srv/rw /ro").exitCode, 1);
-    EXPECT_EQ(readFileText("/mnt/srv/ro/file"), "ro");
+    EXPECT_EQ(contentsOf("/mnt/srv/ro/file"), "ro");
     EXPECT_NE(curl({"--append", "-T", "/mnt/srv/upload-this", "--user", "alice:alice-secret",
                     "ftp://127.0.0.1:2121/ro/file"})
                   .exitCode,
               0);
     EXPECT_EQ(curl({"--user", "alice:alice-secret", "ftp://127.0.0.1:2121/ro/file"}).output, "ro");
-    EXPECT_EQ(readFileText("/mnt/srv/ro/file"), "ro");
+    EXPECT_EQ(contentsOf("/mnt/srv/ro/file"), "ro");
 }
 
 } // namespace

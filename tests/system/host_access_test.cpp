@@ -1,5 +1,6 @@
 // No request without access gets further than 401, whatever its path, method or body.
 #include "tests/host/client.h"
+#include "tests/support/text.h"
 #include "tests/system/support/host_service.h"
 
 #include <array>

@@ -1,4 +1,5 @@
 // Export and import: a document brings back every setting.
+#include "tests/support/text.h"
 #include "tests/system/support/host_service.h"
 
 namespace velt::test {

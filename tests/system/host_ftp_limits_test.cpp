@@ -1,4 +1,5 @@
 // Each FTP setting by veltctl and by curl, seen by clients: time-out, rates, connections, names and contents.
+#include "tests/support/text.h"
 #include "tests/system/support/setting_table.h"
 
 #include <thread>

@@ -1,4 +1,6 @@
 // Texts that try to be more than texts, in every place where a request can put one.
+#include "tests/support/files.h"
+#include "tests/support/text.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/host_service.h"
 
@@ -88,7 +90,7 @@ protected:
         for (const auto& entry : std::filesystem::recursive_directory_iterator(worldRoot / "run")) {
             const std::string name = entry.path().filename();
             if (name.ends_with(".conf") || name.ends_with("_config")) {
-                all += readFileText(entry.path());
+                all += contentsOf(entry.path());
             }
         }
         return all;

@@ -1,5 +1,8 @@
 // What requests leave behind: who made them, what was announced, and what holds when the host ends in
 // between.
+#include "tests/support/files.h"
+#include "tests/support/text.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/host_service.h"
 
@@ -116,7 +119,7 @@ TEST_F(HostRecord, aStopFinishesTheWriteThatRuns) {
     ProcessResult result;
     std::thread writer([&result] { result = veltctl({"ftp", "set", "enable_ftp=on", "timeout=77"}); });
     // The daemon's start is what takes time: the settings are stored by then.
-    while (readFileText(worldRoot / "etc/velt/ftp.conf").find("timeout = 77") == std::string::npos) {
+    while (contentsOf(worldRoot / "etc/velt/ftp.conf").find("timeout = 77") == std::string::npos) {
         std::this_thread::sleep_for(std::chrono::milliseconds(1));
     }
     EXPECT_EQ(stopHost(), 0);
@@ -171,14 +174,8 @@ TEST_F(HostRecord, aKilledSupervisorIsReplacedAndItsDaemonToo) {
     const std::string supervisor = pidsOf("velt-supervise");
     const std::string daemon = pidsOf("proftpd");
     ASSERT_EQ(kill(std::stoi(supervisor), SIGKILL), 0);
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(5);
     const auto servesAnew = [&] { return !contains(pidsOf("proftpd"), daemon) && fetchHome() == "alice"; };
-    bool serves = servesAnew();
-    while (!serves && std::chrono::steady_clock::now() < deadline) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        serves = servesAnew();
-    }
-    EXPECT_TRUE(serves) << "nobody looks after the daemon any more";
+    EXPECT_TRUE(waitUntil(servesAnew, std::chrono::seconds(5))) << "nobody looks after the daemon any more";
     EXPECT_NE(pidsOf("velt-supervise"), "");
 }
 

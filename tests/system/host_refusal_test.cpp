@@ -1,4 +1,5 @@
 // What is refused or fails: which field or port, what was wrong, and that nothing was changed.
+#include "tests/support/text.h"
 #include "tests/system/support/host_service.h"
 
 namespace velt::test {

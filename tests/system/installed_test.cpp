@@ -1,5 +1,6 @@
 // An installation at work: its parts find each other without being told where they are.
 #include "standalone/process/run_program.h"
+#include "tests/support/files.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/leftovers.h"
 #include "tests/system/support/private_world.h"
@@ -58,7 +59,7 @@ TEST_F(InstalledPrograms, serveRealUsers) {
     // Users who are not confined see the shares, of which there are none; the confined see their homes.
     EXPECT_EQ(started.output, "enable_ftp: off -> on\nportnum: 21 -> 2121\nuser_chroot: off -> on\nalice"
                               "enable_ftp: on -> off\n")
-        << started.errors << readFileText(prefix / "veltd.log");
+        << started.errors << contentsOf(prefix / "veltd.log");
 }
 
 } // namespace

@@ -2,6 +2,9 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/core/last_error.h"
+#include "tests/support/files.h"
+#include "tests/support/text.h"
+#include "tests/support/waiting.h"
 
 #include <sys/socket.h>
 
@@ -11,16 +14,6 @@
 
 namespace velt::test {
 namespace {
-
-using Clock = std::chrono::steady_clock;
-
-double secondsSince(Clock::time_point start) {
-    return std::chrono::duration<double>(Clock::now() - start).count();
-}
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 TEST_F(FtpService, idleSessionsEnd) {
     ASSERT_EQ(VELTFTPTimeOutSet(1), 0) << lastErrorSentence();
@@ -160,7 +153,7 @@ TEST_F(FtpService, asciiModeConvertsLineEnds) {
     ASSERT_EQ(session.command("TYPE A").code, 200);
     EXPECT_EQ(session.receive("RETR text"), "a\r\nb\r\n");
     EXPECT_EQ(session.send("STOR sent", "c\r\nd\r\n"), 226);
-    EXPECT_EQ(readFileText("/mnt/home/alice/sent"), "c\nd\n");
+    EXPECT_EQ(contentsOf("/mnt/home/alice/sent"), "c\nd\n");
 }
 
 TEST_F(FtpService, asciiModeOffLeavesContentsAlone) {
@@ -172,7 +165,7 @@ TEST_F(FtpService, asciiModeOffLeavesContentsAlone) {
     ASSERT_EQ(session.command("TYPE A").code, 200);
     EXPECT_EQ(session.receive("RETR text"), "a\nb\n");
     EXPECT_EQ(session.send("STOR sent", "c\r\nd\r\n"), 226);
-    EXPECT_EQ(readFileText("/mnt/home/alice/sent"), "c\r\nd\r\n");
+    EXPECT_EQ(contentsOf("/mnt/home/alice/sent"), "c\r\nd\r\n");
 }
 
 TEST_F(FtpService, umaskKeepsOthersFromWriting) {

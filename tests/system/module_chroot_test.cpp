@@ -1,4 +1,5 @@
 // Chroot users and chroot rules through the module, seen at logins.
+#include "tests/support/text.h"
 #include "tests/system/support/module_service.h"
 
 namespace velt::test {

@@ -1,4 +1,5 @@
 // What the module answers when a request cannot be done, and what its clients have then.
+#include "tests/support/text.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/module_service.h"
 

@@ -1,4 +1,5 @@
 // The FTP settings through the module: time-out, rates, connections, file names and file contents.
+#include "tests/support/waiting.h"
 #include "tests/system/support/module_service.h"
 
 #include <chrono>
@@ -6,12 +7,6 @@
 
 namespace velt::test {
 namespace {
-
-using Clock = std::chrono::steady_clock;
-
-double secondsSince(Clock::time_point start) {
-    return std::chrono::duration<double>(Clock::now() - start).count();
-}
 
 TEST_F(ModuleService, endsIdleSessionsAfterTheTimeOut) {
     ASSERT_EQ(setFtp(R"({"timeout": 1})").code, 0);

@@ -1,4 +1,6 @@
 // The security settings through the module, seen by clients.
+#include "tests/support/files.h"
+#include "tests/support/text.h"
 #include "tests/system/support/module_service.h"
 
 #include <filesystem>
@@ -55,7 +57,7 @@ TEST_F(ModuleSecurity, confinesAnonymousUsersToAShare) {
     ASSERT_EQ(session.logIn("anonymous", "a@b"), 230);
     EXPECT_EQ(session.receive("RETR /about"), "upload");
     EXPECT_EQ(session.send("STOR new", "x"), 226);
-    EXPECT_EQ(readFileText("/mnt/srv/upload/new"), "x");
+    EXPECT_EQ(contentsOf("/mnt/srv/upload/new"), "x");
 }
 
 TEST_F(ModuleSecurity, refusesAShareThatAnonymousUsersCannotReach) {

@@ -1,4 +1,6 @@
 // The SFTP settings through the module, with real clients.
+#include "tests/support/files.h"
+#include "tests/support/text.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/module_service.h"
 
@@ -60,7 +62,7 @@ TEST_F(ModuleSftp, movesUnderARunningTransferWhichFinishes) {
     EXPECT_FALSE(isListening(2222));
     client.join();
     EXPECT_EQ(transfer.exitCode, 0) << transfer.errors;
-    EXPECT_EQ(readFileText("/mnt/srv/slow"), std::string(largeSize, 'x'));
+    EXPECT_EQ(contentsOf("/mnt/srv/slow"), std::string(largeSize, 'x'));
 }
 
 TEST_F(ModuleSftp, endsItsSessionsWhenSwitchedOff) {

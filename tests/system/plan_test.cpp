@@ -3,6 +3,7 @@
 
 #include "standalone/core/last_error.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "tests/support/files.h"
 #include "tests/support/result.h"
 
 #include <linux/capability.h>
@@ -123,8 +124,8 @@ TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {
     const auto next = plan();
     EXPECT_NE(former.folder, next.folder);
     EXPECT_TRUE(fs::exists(former.folder / "proftpd.conf"));
-    EXPECT_EQ(readFileText(former.folder / "anonymous"), "one");
-    EXPECT_EQ(readFileText(next.folder / "anonymous"), "two");
+    EXPECT_EQ(contentsOf(former.folder / "anonymous"), "one");
+    EXPECT_EQ(contentsOf(next.folder / "anonymous"), "two");
     removeFormerPlans(next);
     EXPECT_FALSE(fs::exists(former.folder));
     EXPECT_TRUE(fs::exists(next.folder / "proftpd.conf"));
@@ -148,7 +149,7 @@ TEST_F(FtpPlan, leavesAStoredRuleSetAlone) {
     addShare("music", "music", Access::none);
     storeRules({"u:1001:/music"});
     hash();
-    EXPECT_EQ(readFileText(worldRoot / "etc/velt/chroot_rules"), "velt-chroot-rules 1\nu:1001:/music\n");
+    EXPECT_EQ(contentsOf(worldRoot / "etc/velt/chroot_rules"), "velt-chroot-rules 1\nu:1001:/music\n");
     EXPECT_EQ(modeOf(worldRoot / "etc/velt/chroot_rules"), 0600U);
 }
 

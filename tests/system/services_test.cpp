@@ -7,6 +7,7 @@
 #include "standalone/process/run_program.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/support/daemon_states.h"
+#include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/system/support/ftp_service.h"
 #include "tests/system/support/private_world.h"
@@ -156,7 +157,7 @@ protected:
             runProcess({"ssh-keygen", "-q", "-t", "ed25519", "-N", "", "-f", "/mnt/control-key"}).exitCode,
             0);
         fs::create_directories("/mnt/home/alice/.ssh");
-        writeFile("/mnt/home/alice/.ssh/authorized_keys", readFileText("/mnt/control-key.pub"), aliceId);
+        writeFile("/mnt/home/alice/.ssh/authorized_keys", contentsOf("/mnt/control-key.pub"), aliceId);
         ASSERT_EQ(::chown("/mnt/home/alice/.ssh", aliceId, aliceId), 0);
         writeFile("/mnt/home/alice/large", std::string(300000, 'x'), aliceId);
     }
@@ -190,7 +191,7 @@ TEST_F(ControlledSftp, aTransferOutlivesAPauseAndAMove) {
     EXPECT_EQ(VLIBServiceResume("sftp"), 0) << lastErrorSentence();
     client.join();
     EXPECT_EQ(transfer.exitCode, 0) << transfer.errors;
-    EXPECT_EQ(readFileText("/mnt/control-got").size(), 300000U);
+    EXPECT_EQ(contentsOf("/mnt/control-got").size(), 300000U);
     EXPECT_NE(fetchSlowly(2222).exitCode, 0) << "the former port is closed";
     EXPECT_NE(VELTSFTPIsAlive(), 0);
 }

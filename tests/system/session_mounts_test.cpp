@@ -1,4 +1,5 @@
 // The mounts that show a session what its login may see.
+#include "tests/support/files.h"
 #include "tests/system/support/shared_folders.h"
 
 #include <fcntl.h>
@@ -20,7 +21,7 @@ class SessionMounts : public SharedFolders {};
 // The session that shows shares side by side; "" when there is none.
 std::string sessionProcess() {
     for (const auto& entry : fs::directory_iterator("/proc")) {
-        if (readFileText(entry.path() / "mounts").find("velt-shares") != std::string::npos) {
+        if (contentsOf(entry.path() / "mounts").find("velt-shares") != std::string::npos) {
             return entry.path().filename();
         }
     }
@@ -38,12 +39,12 @@ TEST_F(SessionMounts, areOfTheSessionAlone) {
     ASSERT_EQ(mount("disk", "/mnt/srv/disk", "tmpfs", 0, nullptr), 0);
     // As on a server that systemd has started.
     ASSERT_EQ(mount(nullptr, "/", nullptr, MS_REC | MS_SHARED, nullptr), 0);
-    const std::string before = readFileText("/proc/self/mounts");
+    const std::string before = contentsOf("/proc/self/mounts");
     start();
     {
         FtpSession session(port);
         ASSERT_EQ(session.logIn("alice"), 230);
-        EXPECT_EQ(readFileText("/proc/self/mounts"), before);
+        EXPECT_EQ(contentsOf("/proc/self/mounts"), before);
         const std::string process = sessionProcess();
         const std::string mounts = mountsOf(process);
         EXPECT_NE(mounts.find(worldRoot.string() + "/run/velt/ftp/root/ro"), std::string::npos) << mounts;

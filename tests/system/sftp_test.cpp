@@ -5,6 +5,7 @@
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/process/run_program.h"
 #include "standalone/rules/rule_store.h"
+#include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/ftp_service.h"
@@ -45,7 +46,7 @@ protected:
 
     void allow(const fs::path& home, unsigned id) {
         fs::create_directories(home / ".ssh");
-        writeFile(home / ".ssh" / "authorized_keys", readFileText(key_ + ".pub"), id);
+        writeFile(home / ".ssh" / "authorized_keys", contentsOf(key_ + ".pub"), id);
         ASSERT_EQ(chown((home / ".ssh").c_str(), id, id), 0);
     }
 
@@ -58,9 +59,8 @@ protected:
         ASSERT_TRUE(daemon_.start((*plan)->order));
         std::string known;
         for (const char* kind : {"ed25519", "rsa"}) {
-            known +=
-                "[127.0.0.1]:" + std::to_string(atPort) + ' ' +
-                readFileText(worldRoot / "var/lib/velt/ssh" / ("host_" + std::string(kind) + "_key.pub"));
+            known += "[127.0.0.1]:" + std::to_string(atPort) + ' ' +
+                     contentsOf(worldRoot / "var/lib/velt/ssh" / ("host_" + std::string(kind) + "_key.pub"));
         }
         writeFile("/mnt/known", known);
     }
@@ -94,8 +94,8 @@ TEST_F(SftpService, transfersFilesBothWays) {
     start(port);
     const auto result = sftp("get file /mnt/got\nput /etc/hostname sent\n");
     EXPECT_EQ(result.exitCode, 0) << result.errors;
-    EXPECT_EQ(readFileText("/mnt/got"), "contents");
-    EXPECT_EQ(readFileText("/mnt/home/alice/sent"), readFileText("/etc/hostname"));
+    EXPECT_EQ(contentsOf("/mnt/got"), "contents");
+    EXPECT_EQ(contentsOf("/mnt/home/alice/sent"), contentsOf("/etc/hostname"));
     fs::remove("/mnt/got");
     fs::remove("/mnt/home/alice/sent");
 }
@@ -132,7 +132,7 @@ TEST_F(SftpService, goesByTheRightsOfTheFileSystemAlone) {
     ASSERT_EQ(messageOf(velt::storeRules({{true, aliceId, "/home"}})), "");
     start(port);
     EXPECT_EQ(sftp("get /mnt/srv/share/open /mnt/got\n").exitCode, 0);
-    EXPECT_EQ(readFileText("/mnt/got"), "for all");
+    EXPECT_EQ(contentsOf("/mnt/got"), "for all");
     EXPECT_NE(sftp("get /mnt/srv/share/own /mnt/got\n").exitCode, 0);
     fs::remove("/mnt/got");
     fs::remove_all("/mnt/srv/share");
@@ -147,9 +147,9 @@ TEST_F(SftpService, listensOnTheStoredPortOnly) {
 
 TEST_F(SftpService, keepsItsIdentityOverRestarts) {
     start(port);
-    const std::string first = readFileText("/mnt/known");
+    const std::string first = contentsOf("/mnt/known");
     start(port);
-    EXPECT_EQ(readFileText("/mnt/known"), first);
+    EXPECT_EQ(contentsOf("/mnt/known"), first);
     EXPECT_EQ(sftp("pwd\n").exitCode, 0);
 }
 

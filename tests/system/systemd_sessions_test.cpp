@@ -5,6 +5,8 @@
 #include "standalone/control/systemd_unit.h"
 #include "standalone/core/last_error.h"
 #include "standalone/standalone.h"
+#include "tests/support/files.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/systemd_services.h"
 
 #include <csignal>
@@ -49,7 +51,7 @@ TEST_F(UnderSystemd, aStopEndsSessionsWhereverTheyWereMoved) {
             if (fs::exists("/lib/systemd/system/systemd-logind.service")) {
                 const auto sessions = descendantsOf(state.daemon.pid);
                 ASSERT_FALSE(sessions.empty());
-                const std::string place = textOf("/proc/" + std::to_string(sessions[0].pid) + "/cgroup");
+                const std::string place = contentsOf("/proc/" + std::to_string(sessions[0].pid) + "/cgroup");
                 EXPECT_NE(place.find("/session-"), std::string::npos)
                     << "not what this test is about: " << place;
             }
@@ -146,7 +148,7 @@ void installAndEnableHost() {
 
 /// From when on its socket answers, the host has started what is enabled.
 bool hostAnswers() {
-    return comesTrue(
+    return waitUntil(
         [] {
             return runProcess({"/usr/local/bin/veltctl", "status"}).exitCode == 0;
         },
@@ -214,7 +216,7 @@ TEST_F(UnderSystemd, quotedWordsArriveAsTheyAre) {
             << "[Service]\nType=oneshot\nStandardOutput=file:/run/words\n"
             << "ExecStart=/usr/bin/printf \"%%s|\"" << line << '\n';
         EXPECT_EQ(runProcess({"systemctl", "start", "words.service"}).exitCode, 0);
-        EXPECT_EQ(textOf("/run/words"), expected);
+        EXPECT_EQ(contentsOf("/run/words"), expected);
     });
 }
 

@@ -7,7 +7,9 @@
 #include "standalone/core/last_error.h"
 #include "standalone/shares/share_store.h"
 #include "standalone/standalone.h"
+#include "tests/support/files.h"
 #include "tests/support/result.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/systemd_services.h"
 
 #include <csignal>
@@ -30,7 +32,7 @@ TEST_F(UnderSystemd, theFtpDaemonFollowsTheStoredSettings) {
         ASSERT_EQ(VLIBServiceStart("ftpd", 0), 0) << lastErrorSentence();
         EXPECT_EQ(fetchByFtp(), "alice");
         EXPECT_EQ(unitState("velt-ftpd.service"), "active");
-        EXPECT_EQ(textOf("/etc/velt/run-keys/ftpd"), "1\n");
+        EXPECT_EQ(contentsOf("/etc/velt/run-keys/ftpd"), "1\n");
         const DaemonState first = serviceState("ftpd");
         EXPECT_EQ(unitProperty("velt-ftpd.service", "MainPID"), std::to_string(first.supervisor.pid));
         for (const char* name : {"ftpd", "ftpd-pure", "ftpd-ssl"}) {
@@ -135,7 +137,7 @@ TEST_F(UnderSystemd, aKilledSupervisorComesBackForTheLastSettingsAndNotAfterASto
 
         signalProcess(serviceState("sftp").supervisor, SIGKILL);
         EXPECT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
-        EXPECT_FALSE(comesTrue([] { return isServing(serviceState("sftp")); }, seconds(1)));
+        EXPECT_FALSE(waitUntil([] { return isServing(serviceState("sftp")); }, seconds(1)));
         EXPECT_EQ(unitState("velt-sftp.service"), "inactive");
     });
 }
@@ -175,14 +177,14 @@ TEST_F(UnderSystemd, theShareRootIsTheDaemonsOwn) {
         std::ofstream("/srv/music/about") << "music";
         ASSERT_EQ(messageOf(storeShares({{"music", "", "/srv/music", true, {{"alice", Access::read}}, {}}})),
                   "");
-        const std::string mounts = textOf("/proc/1/mounts");
+        const std::string mounts = contentsOf("/proc/1/mounts");
         storeFtp(plain, 21, false);
         ASSERT_EQ(VLIBServiceStart("ftpd", 0), 0) << lastErrorSentence();
         EXPECT_EQ(fetchByFtp("/music/about"), "music");
         EXPECT_EQ(fetchByFtp("//etc/passwd"), "");
-        EXPECT_EQ(textOf("/proc/1/mounts"), mounts);
+        EXPECT_EQ(contentsOf("/proc/1/mounts"), mounts);
         ASSERT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
-        EXPECT_EQ(textOf("/proc/1/mounts"), mounts);
+        EXPECT_EQ(contentsOf("/proc/1/mounts"), mounts);
     });
 }
 

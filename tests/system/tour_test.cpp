@@ -1,5 +1,7 @@
 // The quick start and the README's tour, as somebody does them who reads the page and copies its commands.
 #include "standalone/process/run_program.h"
+#include "tests/support/files.h"
+#include "tests/support/text.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/leftovers.h"
 #include "tests/system/support/private_world.h"
@@ -79,10 +81,6 @@ std::string replaced(std::string text, const std::string& from, const std::strin
     return at == std::string::npos ? text : text.replace(at, from.size(), to);
 }
 
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
-
 // One shell runs all steps, as for somebody who copies them one after the other.
 std::vector<std::string> outputsOf(const std::string& all, std::size_t steps) {
     std::vector<std::string> outputs;
@@ -101,7 +99,7 @@ std::vector<std::string> outputsOf(const std::string& all, std::size_t steps) {
 }
 
 TEST_F(QuickStart, theTourGoesAsTheReadmeSays) {
-    const std::string page = readFileText(sources / "README.md");
+    const std::string page = contentsOf(sources / "README.md");
     const std::vector<TourStep> steps = stepsOf(page);
     ASSERT_GE(steps.size(), 6U);
     std::string commands;
@@ -237,14 +235,14 @@ TEST_F(QuickStart, worksBelowAClosedFolder) {
     const fs::path closed = "/mnt/closed";
     furnishTree(closed / "tree");
     fs::permissions(closed, fs::perms::owner_all);
-    const std::string mounts = readFileText("/proc/self/mounts");
+    const std::string mounts = contentsOf("/proc/self/mounts");
     const std::string start = run(closed / "tree", startBuilt);
     EXPECT_EQ(run(closed / "tree",
                   ". var/env; veltctl ftp set enable_ftp=on; curl -sS -T README.md ftp://127.0.0.1:2121/"),
               "enable_ftp: off -> on\n")
         << start;
-    EXPECT_EQ(readFileText(closed / "tree/var/demo/README.md"), readFileText(sources / "README.md"));
-    EXPECT_EQ(readFileText("/proc/self/mounts"), mounts);
+    EXPECT_EQ(contentsOf(closed / "tree/var/demo/README.md"), contentsOf(sources / "README.md"));
+    EXPECT_EQ(contentsOf("/proc/self/mounts"), mounts);
     run(closed / "tree", "scripts/start --stop");
     fs::remove_all(closed);
 }
@@ -292,7 +290,7 @@ TEST_F(QuickStart, worksWithoutRootsRights) {
                 " -sS",
             asCarol);
     EXPECT_EQ(upload, "enable_ftp: off -> on\n");
-    EXPECT_EQ(readFileText(tree_ / "var/demo/README.md"), readFileText(sources / "README.md"));
+    EXPECT_EQ(contentsOf(tree_ / "var/demo/README.md"), contentsOf(sources / "README.md"));
     EXPECT_EQ(modeOf(tree_ / "var/demo-password"), 0600U);
     EXPECT_TRUE(contains(run(tree_, startHere), "var/ was made by carol."))
         << "root takes over what is carol's";
@@ -323,7 +321,7 @@ TEST_F(QuickStart, writesNothingOutsideItsTree) {
     const std::string output = run(tree_, seal + startBuilt + " >/dev/null\n" + use, {"unshare", "--mount"});
     EXPECT_EQ(output, "enable_ftp: off -> on\nenable_ftps: off -> on\nenable: off -> on\n"
                       "veltd and its services are stopped; var/ keeps their settings.\n");
-    EXPECT_EQ(readFileText(tree_ / "var/demo/README.md"), readFileText(sources / "README.md"));
+    EXPECT_EQ(contentsOf(tree_ / "var/demo/README.md"), contentsOf(sources / "README.md"));
     EXPECT_EQ(run(tree_, "nft list tables"), "");
 }
 

@@ -3,16 +3,14 @@
 
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
+#include "tests/support/files.h"
+#include "tests/support/text.h"
 #include <cstring>
 
 namespace velt::test {
 namespace {
 
 const std::string certificate = worldRoot / "var/lib/velt/tls/server.crt";
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 ProcessResult tlsClient(std::vector<std::string> arguments) {
     arguments.insert(arguments.begin(), {"openssl", "s_client", "-connect", "127.0.0.1:2121", "-starttls",
@@ -97,7 +95,7 @@ TEST_F(FtpService, lftpTransfersUnderTls) {
         {}, std::chrono::seconds(30));
     EXPECT_EQ(result.exitCode, 0) << result.errors;
     EXPECT_TRUE(contains(result.output, "alice")) << result.output;
-    EXPECT_EQ(readFileText("/mnt/home/alice/sent"), readFileText("/etc/hostname"));
+    EXPECT_EQ(contentsOf("/mnt/home/alice/sent"), contentsOf("/etc/hostname"));
 }
 
 TEST_F(FtpService, oldTlsVersionsAreRefused) {

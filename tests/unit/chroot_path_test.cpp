@@ -2,11 +2,11 @@
 
 #include "module/entry_functions.h"
 #include "tests/support/handler_test.h"
+#include "tests/support/temporary_folder.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 
@@ -23,9 +23,6 @@ class ChrootPathTest : public HandlerTest {
 protected:
     void SetUp() override {
         HandlerTest::SetUp();
-        std::string pattern = (fs::temp_directory_path() / "velt-chroot-XXXXXX").string();
-        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
-        root_ = pattern;
         fs::create_directories(folder() / "a" / "b");
         std::ofstream(folder() / "file") << "text";
         ASSERT_EQ(mkfifo((folder() / "pipe").c_str(), 0600), 0);
@@ -34,12 +31,7 @@ protected:
         platform.users = {{"alice", {"", 1001}}};
     }
 
-    void TearDown() override {
-        fs::remove_all(root_);
-        HandlerTest::TearDown();
-    }
-
-    fs::path folder() const { return root_ / "media"; }
+    fs::path folder() const { return root_.path() / "media"; }
 
     /// Loads one rule with `path` and returns its "path_exist". Exactly the share `share` must have been
     /// looked up.
@@ -64,7 +56,7 @@ protected:
         return rule["path_exist"].asBool();
     }
 
-    fs::path root_;
+    const velt::test::TemporaryFolder root_;
 
 private:
     int loads_ = 0;
@@ -74,7 +66,7 @@ private:
 } // namespace
 
 TEST_F(ChrootPathTest, ExistsAsHomeWithoutALookAtTheDisk) {
-    platform.shares["home"].path = (root_ / "missing").string();
+    platform.shares["home"].path = (root_.path() / "missing").string();
     platform.rules = {"user:1001:/home"};
     EXPECT_EQ(
         run(FTPChrootUserLoad),
@@ -109,7 +101,7 @@ TEST_F(ChrootPathTest, ExistsAsAFolderBelowTheShare) {
 TEST_F(ChrootPathTest, TakesTheShareByNameAndNotByItsFolder) {
     platform.shares["video"].path = folder().string();
     EXPECT_TRUE(exists("/video/a/b", "video"));
-    fs::create_directories(root_ / "books");
+    fs::create_directories(root_.path() / "books");
     EXPECT_FALSE(exists("/books", "books"));
 }
 
@@ -133,7 +125,7 @@ TEST_F(ChrootPathTest, IsMissingWithoutTheFolder) {
     EXPECT_FALSE(exists("/media/gone", "media"));
     EXPECT_FALSE(exists("/media/a/gone", "media"));
     EXPECT_FALSE(exists("/media/A", "media"));
-    platform.shares["old"].path = (root_ / "gone").string();
+    platform.shares["old"].path = (root_.path() / "gone").string();
     EXPECT_FALSE(exists("/old", "old"));
     EXPECT_FALSE(exists("/old/a", "old"));
 }

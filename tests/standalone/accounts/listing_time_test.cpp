@@ -1,7 +1,7 @@
 #include "platform/sdk_user.h"
 #include "standalone/accounts/account_sources.h"
 #include "standalone/accounts/user_directory.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

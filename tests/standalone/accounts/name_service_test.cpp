@@ -1,7 +1,7 @@
 #include "standalone/accounts/name_service.h"
 
 #include "standalone/accounts/account_sources.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

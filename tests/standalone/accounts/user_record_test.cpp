@@ -3,7 +3,7 @@
 #include "platform/sdk_user.h"
 #include "standalone/accounts/account_sources.h"
 #include "standalone/core/last_error.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -11,6 +11,8 @@
 #include "tests/standalone/control/plan_double.h"
 #include "tests/standalone/supervise/daemon_test.h"
 #include "tests/standalone/support/daemon_states.h"
+#include "tests/support/ports.h"
+#include "tests/support/waiting.h"
 
 #include <unistd.h>
 

@@ -1,6 +1,8 @@
 // Supervisors that end without having been asked to.
 #include "standalone/standalone.h"
 #include "tests/standalone/control/services_fixture.h"
+#include "tests/support/ports.h"
+#include "tests/support/waiting.h"
 
 #include <csignal>
 #include <optional>

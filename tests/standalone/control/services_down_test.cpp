@@ -1,6 +1,7 @@
 // What an administrator is told of services that are switched on and do not serve.
 #include "standalone/standalone.h"
 #include "tests/standalone/control/services_fixture.h"
+#include "tests/support/waiting.h"
 
 #include <fstream>
 

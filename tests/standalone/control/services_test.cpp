@@ -3,6 +3,8 @@
 #include "standalone/core/effects.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/control/services_fixture.h"
+#include "tests/support/ports.h"
+#include "tests/support/waiting.h"
 
 #include <sys/wait.h>
 #include <unistd.h>

@@ -10,7 +10,9 @@
 #include "standalone/core/state_root.h"
 #include "standalone/process/run_program.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/ports.h"
 #include "tests/support/result.h"
+#include "tests/support/waiting.h"
 
 #include <csignal>
 #include <fstream>

@@ -1,7 +1,7 @@
 #include "standalone/core/trusted_file.h"
 
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -3,8 +3,8 @@
 
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_store.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -5,7 +5,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/journal/event_file.h"
 #include "standalone/standalone.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 #include <json/json.h>

@@ -3,7 +3,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/support/process.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

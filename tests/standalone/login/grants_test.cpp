@@ -1,6 +1,6 @@
 #include "standalone/login/grants.h"
 
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 // The FTP daemon's module at a login, where the daemon or the program that makes the view cannot do their
 // part.
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

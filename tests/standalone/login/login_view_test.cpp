@@ -4,8 +4,8 @@
 #include "standalone/core/state_root.h"
 #include "standalone/rules/rule_store.h"
 #include "standalone/shares/share_store.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 #include "standalone/login/open_folder.h"
 
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -2,8 +2,8 @@
 #include "standalone/login/view_mounts.h"
 
 #include "standalone/login/open_folder.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -5,6 +5,7 @@
 #include "standalone/ports/port_range.h"
 #include "standalone/process/listening_sockets.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/ports.h"
 #include "tests/support/result.h"
 
 #include <netinet/in.h>

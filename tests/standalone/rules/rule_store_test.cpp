@@ -1,7 +1,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/rules/rule_store.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

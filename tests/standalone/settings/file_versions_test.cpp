@@ -4,19 +4,15 @@
 #include "standalone/settings/network_settings.h"
 #include "standalone/settings/settings_files.h"
 #include "tests/standalone/settings/settings_fixture.h"
-
-#include <fstream>
-#include <sstream>
+#include "tests/support/files.h"
 
 namespace velt {
 namespace {
 
 std::string versionOne(const std::string& name) {
-    std::ifstream file(VERSION_1_FILES "/" + name);
-    std::stringstream text;
-    text << file.rdbuf();
-    EXPECT_NE(text.str(), "") << name;
-    return text.str();
+    std::string text = test::contentsOf(VERSION_1_FILES "/" + name);
+    EXPECT_NE(text, "") << name;
+    return text;
 }
 
 class FileVersions1 : public test::SettingsTest {

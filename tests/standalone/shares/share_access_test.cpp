@@ -6,8 +6,8 @@
 #include "standalone/core/state_root.h"
 #include "standalone/shares/folder_access.h"
 #include "standalone/shares/share_store.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

@@ -5,8 +5,8 @@
 #include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

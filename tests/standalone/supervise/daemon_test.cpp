@@ -1,6 +1,7 @@
 #include "tests/standalone/supervise/daemon_test.h"
 
 #include "standalone/core/state_root.h"
+#include "tests/support/waiting.h"
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
@@ -11,7 +12,6 @@
 
 #include <csignal>
 #include <cstdlib>
-#include <thread>
 
 namespace velt::test {
 namespace {
@@ -40,33 +40,6 @@ int connectTo(int port) {
 }
 
 } // namespace
-
-int freePort() {
-    // Tests run side by side, so each process begins its search elsewhere. In wide steps, for tests that ask
-    // about ranges.
-    static int next = (::getpid() * 370) % 10000;
-    for (;;) {
-        next = (next + 20) % 10000;
-        const int port = 20000 + next;
-        const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-        const bool isFree = bindTo(descriptor, port);
-        ::close(descriptor);
-        if (isFree) {
-            return port;
-        }
-    }
-}
-
-bool waitUntil(const std::function<bool()>& condition, std::chrono::milliseconds limit) {
-    const auto deadline = std::chrono::steady_clock::now() + limit;
-    while (!condition()) {
-        if (std::chrono::steady_clock::now() >= deadline) {
-            return false;
-        }
-        std::this_thread::sleep_for(std::chrono::milliseconds(5));
-    }
-    return true;
-}
 
 bool accepts(int port) {
     const int descriptor = connectTo(port);

@@ -7,18 +7,11 @@
 
 #include <gtest/gtest.h>
 
-#include <chrono>
 #include <filesystem>
-#include <functional>
 #include <string>
 #include <vector>
 
 namespace velt::test {
-
-/// A loopback port that was free a moment ago, outside the kernel's range for connections.
-int freePort();
-
-bool waitUntil(const std::function<bool()>& condition, std::chrono::milliseconds limit);
 
 /// Whether somebody answers on the loopback port.
 bool accepts(int port);

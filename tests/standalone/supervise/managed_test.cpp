@@ -7,6 +7,7 @@
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/daemon_state.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/ports.h"
 #include "tests/support/result.h"
 
 #include <spawn.h>

@@ -5,7 +5,9 @@
 #include "standalone/core/state_root.h"
 #include "standalone/process/listening_sockets.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/ports.h"
 #include "tests/support/result.h"
+#include "tests/support/waiting.h"
 
 #include <sys/wait.h>
 #include <unistd.h>

@@ -3,6 +3,7 @@
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/last_error.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/ports.h"
 
 #include <fcntl.h>
 #include <sched.h>

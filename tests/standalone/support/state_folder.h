@@ -3,7 +3,7 @@
 #define VELT_TESTS_STANDALONE_SUPPORT_STATE_FOLDER_H
 
 #include "standalone/core/state_root.h"
-#include "tests/standalone/support/temporary_folder.h"
+#include "tests/support/temporary_folder.h"
 
 namespace velt::test {
 

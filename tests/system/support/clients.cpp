@@ -1,5 +1,8 @@
 #include "tests/system/support/clients.h"
 
+#include "tests/support/files.h"
+#include "tests/support/text.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/private_world.h"
 
@@ -18,21 +21,11 @@ namespace fs = std::filesystem;
 
 namespace {
 
-using Clock = std::chrono::steady_clock;
-
 constexpr std::size_t ratedSize = 150'000;
 const std::string latin1 = "gr\xfc\xdf";
 const std::string utf8 = "gr\xc3\xbc\xc3\x9f";
 
-double secondsSince(Clock::time_point start) {
-    return std::chrono::duration<double>(Clock::now() - start).count();
-}
-
 } // namespace
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 std::string namesIn(FtpSession& session) {
     return session.receive("NLST").value_or("(refused)");
@@ -144,7 +137,7 @@ void furnishSftp() {
     fs::create_directories("/mnt/srv");
     ASSERT_EQ(runProcess({"ssh-keygen", "-q", "-t", "ed25519", "-N", "", "-f", "/mnt/srv/key"}).exitCode, 0);
     fs::create_directories("/mnt/home/alice/.ssh");
-    writeFile("/mnt/home/alice/.ssh/authorized_keys", readFileText("/mnt/srv/key.pub"), aliceId);
+    writeFile("/mnt/home/alice/.ssh/authorized_keys", contentsOf("/mnt/srv/key.pub"), aliceId);
     ASSERT_EQ(::chown("/mnt/home/alice/.ssh", aliceId, aliceId), 0);
     writeFile("/mnt/home/alice/large", std::string(largeSize, 'x'), aliceId);
 }

@@ -16,8 +16,6 @@ namespace velt::test {
 /// Where the tests have FTP listen.
 inline constexpr int ftpTestPort = 2121;
 
-bool contains(const std::string& text, const std::string& part);
-
 /// Writes the file of the shares: "public" (anonymous users read it), "music", "upload" (they write) and
 /// "closed", each a folder of that name below /mnt/srv with one file "about" that holds the name. Alice, bob
 /// and carol may write in all of them.

@@ -1,4 +1,6 @@
 #include "tests/system/support/daemon_process.h"
+#include "tests/support/files.h"
+#include "tests/support/waiting.h"
 
 #include <fcntl.h>
 #include <spawn.h>
@@ -13,7 +15,6 @@
 #include <iostream>
 #include <sstream>
 #include <string>
-#include <thread>
 #include <vector>
 
 namespace velt::test {
@@ -61,18 +62,19 @@ bool isListening(int port) {
 
 bool DaemonProcess::start(const DaemonOrder& order) {
     pid_ = spawn(order);
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(5);
-    while (pid_ > 0 && std::chrono::steady_clock::now() < deadline) {
-        if (std::ranges::all_of(order.ports, isListening)) {
-            return true;
-        }
-        if (waitpid(pid_, nullptr, WNOHANG) == pid_) {
+    bool listens = false;
+    const auto listensOrEnded = [&] {
+        listens = pid_ > 0 && std::ranges::all_of(order.ports, isListening);
+        if (!listens && pid_ > 0 && waitpid(pid_, nullptr, WNOHANG) == pid_) {
             pid_ = -1;
         }
-        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        return listens || pid_ < 0;
+    };
+    waitUntil(listensOrEnded, std::chrono::seconds(5));
+    if (!listens) {
+        std::cerr << contentsOf(outputFile);
     }
-    std::cerr << std::ifstream(outputFile).rdbuf();
-    return false;
+    return listens;
 }
 
 void DaemonProcess::stop() {

@@ -7,7 +7,6 @@
 #include <unistd.h>
 
 #include <fstream>
-#include <iterator>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -15,11 +14,6 @@ namespace fs = std::filesystem;
 void writeFile(const fs::path& path, const std::string& contents, unsigned owner) {
     std::ofstream(path, std::ios::binary) << contents;
     EXPECT_EQ(chown(path.c_str(), owner, owner), 0) << path;
-}
-
-std::string readFileText(const fs::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
 }
 
 unsigned modeOf(const fs::path& path) {

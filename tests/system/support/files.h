@@ -8,8 +8,6 @@
 namespace velt::test {
 
 void writeFile(const std::filesystem::path& path, const std::string& contents, unsigned owner = 0);
-/// "" when there is no such file.
-std::string readFileText(const std::filesystem::path& path);
 /// The permission bits; 0 when there is no such file.
 unsigned modeOf(const std::filesystem::path& path);
 

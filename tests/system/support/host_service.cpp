@@ -1,5 +1,6 @@
 #include "tests/system/support/host_service.h"
 
+#include "tests/support/files.h"
 #include "tests/system/support/leftovers.h"
 
 #include <json/reader.h>
@@ -39,7 +40,7 @@ void HostService::SetUp() {
     if (!whyNoWorld().empty()) {
         GTEST_SKIP() << whyNoWorld();
     }
-    mounts_ = readFileText("/proc/self/mounts");
+    mounts_ = contentsOf("/proc/self/mounts");
     furnishHomes();
     makeShares();
     fs::copy_file(VELT_BUILT_FOLDER "/veltctl", "/mnt/veltctl", fs::copy_options::overwrite_existing);
@@ -61,7 +62,7 @@ void HostService::TearDown() {
         EXPECT_EQ(stopHost(), 0) << hostLog();
     }
     EXPECT_EQ(lastingProcesses(), "");
-    EXPECT_EQ(readFileText("/proc/self/mounts"), mounts_);
+    EXPECT_EQ(contentsOf("/proc/self/mounts"), mounts_);
     EXPECT_FALSE(somethingListens());
     clearFolders();
     fs::remove(logFile);
@@ -147,7 +148,7 @@ std::string HostService::exported() {
 }
 
 std::string HostService::hostLog() {
-    return readFileText(logFile);
+    return contentsOf(logFile);
 }
 
 } // namespace velt::test

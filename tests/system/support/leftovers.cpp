@@ -1,5 +1,7 @@
 #include "tests/system/support/leftovers.h"
 
+#include "tests/support/files.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/files.h"
 
 #include <sys/wait.h>
@@ -9,7 +11,6 @@
 #include <cctype>
 #include <chrono>
 #include <filesystem>
-#include <thread>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -25,7 +26,7 @@ std::string processesLeft() {
         const std::string name = entry.path().filename();
         if (std::ranges::all_of(name, [](unsigned char c) { return std::isdigit(c) != 0; }) &&
             std::stoi(name) != getpid()) {
-            left += name + " " + readFileText(entry.path() / "comm");
+            left += name + " " + contentsOf(entry.path() / "comm");
         }
     }
     return left;
@@ -34,18 +35,14 @@ std::string processesLeft() {
 } // namespace
 
 std::string lastingProcesses() {
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(3);
-    std::string left = processesLeft();
-    while (!left.empty() && std::chrono::steady_clock::now() < deadline) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-        left = processesLeft();
-    }
+    std::string left;
+    waitUntil([&] { return (left = processesLeft()).empty(); }, std::chrono::seconds(3));
     return left;
 }
 
 bool somethingListens() {
     constexpr const char* listenState = " 0A ";
-    const std::string sockets = readFileText("/proc/net/tcp") + readFileText("/proc/net/tcp6");
+    const std::string sockets = contentsOf("/proc/net/tcp") + contentsOf("/proc/net/tcp6");
     return sockets.find(listenState) != std::string::npos;
 }
 

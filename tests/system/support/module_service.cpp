@@ -1,5 +1,6 @@
 #include "tests/system/support/module_service.h"
 
+#include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/system/support/leftovers.h"
 
@@ -40,7 +41,7 @@ void ModuleService::SetUp() {
     furnishHomes();
     ASSERT_EQ(setSecurity(R"({"user_chroot": true})").code, 0) << lastErrorSentence();
     lastEntry_ = logEntries().back().id;
-    mounts_ = readFileText("/proc/self/mounts");
+    mounts_ = contentsOf("/proc/self/mounts");
     subscription_ = subscribeEvents([this](const SystemEvent& event) {
         const std::lock_guard lock(mutex_);
         EXPECT_EQ(event.name, "velt.service.action");
@@ -56,7 +57,7 @@ void ModuleService::TearDown() {
     EXPECT_EQ(setFtp(R"({"enable_ftp": false})").code, 0) << lastErrorSentence();
     EXPECT_EQ(setSftp(R"({"enable": false})").code, 0) << lastErrorSentence();
     EXPECT_EQ(lastingProcesses(), "");
-    EXPECT_EQ(readFileText("/proc/self/mounts"), mounts_);
+    EXPECT_EQ(contentsOf("/proc/self/mounts"), mounts_);
     EXPECT_FALSE(somethingListens());
     clearFolders();
 }

@@ -1,4 +1,5 @@
 #include "tests/system/support/running_program.h"
+#include "tests/support/waiting.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -9,7 +10,6 @@
 #include <array>
 #include <csignal>
 #include <stdexcept>
-#include <thread>
 #include <utility>
 
 namespace velt::test {
@@ -98,14 +98,8 @@ void RunningProgram::signal(int number) const {
 }
 
 int RunningProgram::wait(std::chrono::milliseconds limit) {
-    const auto deadline = std::chrono::steady_clock::now() + limit;
     int status = 0;
-    pid_t ended = 0;
-    while (pid_ > 0 && (ended = waitpid(pid_, &status, WNOHANG)) == 0 &&
-           std::chrono::steady_clock::now() < deadline) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(5));
-    }
-    if (ended != pid_ || pid_ <= 0) {
+    if (pid_ <= 0 || !waitUntil([&] { return waitpid(pid_, &status, WNOHANG) == pid_; }, limit)) {
         return -1;
     }
     pid_ = -1;

@@ -5,6 +5,7 @@
 #include "standalone/core/last_error.h"
 #include "standalone/standalone.h"
 #include "tests/support/result.h"
+#include "tests/support/waiting.h"
 
 #include <unistd.h>
 
@@ -12,7 +13,6 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <sstream>
 #include <vector>
 
 namespace velt::test {
@@ -74,29 +74,12 @@ std::string unitProperty(const std::string& unit, const std::string& name) {
     return value;
 }
 
-std::string textOf(const fs::path& file) {
-    std::ostringstream text;
-    text << std::ifstream(file).rdbuf();
-    return text.str();
-}
-
 std::string unitState(const std::string& unit) {
     return unitProperty(unit, "ActiveState");
 }
 
-bool comesTrue(const std::function<bool()>& condition, milliseconds limit) {
-    const auto deadline = std::chrono::steady_clock::now() + limit;
-    while (!condition()) {
-        if (std::chrono::steady_clock::now() >= deadline) {
-            return false;
-        }
-        std::this_thread::sleep_for(milliseconds(10));
-    }
-    return true;
-}
-
 bool isBack(const std::string& service, const ProcessId& former) {
-    return comesTrue(
+    return waitUntil(
         [&] {
             const DaemonState state = serviceState(service);
             return state.daemon != former && isServing(state);
@@ -127,7 +110,7 @@ SlowTransfer::SlowTransfer(int fromPort)
                                seconds(30));
       }) {
     std::error_code error;
-    EXPECT_TRUE(comesTrue([&] { return fs::exists(got) && fs::file_size(got, error) > 0; }, seconds(10)));
+    EXPECT_TRUE(waitUntil([&] { return fs::exists(got) && fs::file_size(got, error) > 0; }, seconds(10)));
 }
 
 SlowTransfer::~SlowTransfer() {

@@ -8,7 +8,6 @@
 
 #include <gtest/gtest.h>
 
-#include <chrono>
 #include <filesystem>
 #include <functional>
 #include <memory>
@@ -41,12 +40,8 @@ void storeSftp(bool enabled, int atPort = 2222);
 std::string unitState(const std::string& unit);
 std::string unitProperty(const std::string& unit, const std::string& name);
 
-bool comesTrue(const std::function<bool()>& condition, std::chrono::milliseconds limit);
-
 /// Whether the service is back within two seconds, with another daemon than the former.
 bool isBack(const std::string& service, const ProcessId& former);
-
-std::string textOf(const std::filesystem::path& file);
 
 /// What alice gets when she fetches this path by FTP; "" when she is refused.
 std::string fetchByFtp(const std::string& path = "/home-of", int fromPort = 21);

@@ -2,6 +2,7 @@
 
 #include "base/unique_fd.h"
 #include "standalone/process/run_program.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/systemd_root.h"
 
 #include <fcntl.h>
@@ -24,7 +25,6 @@
 #include <iostream>
 #include <optional>
 #include <sstream>
-#include <thread>
 
 namespace velt::test {
 namespace {
@@ -165,10 +165,7 @@ void SystemdWorld::boot() {
 
 void SystemdWorld::waitUntilBooted() {
     const bool booted = inside([] {
-        const auto deadline = std::chrono::steady_clock::now() + seconds(20);
-        while (!fs::exists("/run/systemd/private") && std::chrono::steady_clock::now() < deadline) {
-            std::this_thread::sleep_for(milliseconds(10));
-        }
+        waitUntil([] { return fs::exists("/run/systemd/private"); }, seconds(20));
         const std::string state =
             runProcess({"systemctl", "is-system-running", "--wait"}, {}, seconds(30)).output;
         // What else may fail on a machine like this one is not what the tests are about.
@@ -206,12 +203,8 @@ bool SystemdWorld::inside(const std::function<void()>& act) {
 
 void SystemdWorld::reboot() {
     inside([] { runProcess({"systemctl", "reboot"}); });
-    const auto deadline = std::chrono::steady_clock::now() + seconds(30);
-    while (::waitpid(init_, nullptr, WNOHANG) != init_) {
-        if (std::chrono::steady_clock::now() >= deadline) {
-            throw std::runtime_error("the machine does not shut down");
-        }
-        std::this_thread::sleep_for(milliseconds(10));
+    if (!waitUntil([this] { return ::waitpid(init_, nullptr, WNOHANG) == init_; }, seconds(30))) {
+        throw std::runtime_error("the machine does not shut down");
     }
     init_ = -1;
     boot();

@@ -5,8 +5,8 @@
 #include "standalone/process/last_words.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/daemons/proftpd/example.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 

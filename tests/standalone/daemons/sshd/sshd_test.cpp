@@ -4,8 +4,8 @@
 #include "standalone/daemons/sshd/sshd_configuration.h"
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "tests/standalone/support/golden.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
 
 #include <sys/stat.h>
 

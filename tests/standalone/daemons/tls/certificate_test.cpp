@@ -4,18 +4,15 @@
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/daemons/tls/self_signed.h"
 #include "standalone/process/run_program.h"
-#include "tests/standalone/support/temporary_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/temporary_folder.h"
+#include "tests/support/text.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
 namespace velt::test {
 namespace {
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
-}
 
 std::string described(const std::string& certificate) {
     // Versions differ in how they write a name unless they are told.
