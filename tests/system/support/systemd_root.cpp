@@ -1,5 +1,6 @@
 #include "tests/system/support/systemd_root.h"
 
+#include "tests/support/files.h"
 #include "tests/system/support/systemd_world.h"
 
 #include <crypt.h>
@@ -12,9 +13,12 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <set>
+#include <sstream>
 
 namespace velt::test {
 namespace {
@@ -50,6 +54,47 @@ void write(const fs::path& file, const std::string& text) {
 
 void append(const fs::path& file, const std::string& text) {
     std::ofstream(file, std::ios::app) << text;
+}
+
+/// The lines of a file of accounts or groups whose third field, the number, is one of the system's own; no
+/// person on the real machine has an account here, so that "alice" is ours. The names of those that stay.
+std::set<std::string> keepSystemAccounts(const fs::path& file) {
+    std::istringstream lines(contentsOf(file));
+    std::set<std::string> names;
+    std::string kept;
+    for (std::string line; std::getline(lines, line);) {
+        std::istringstream fields(line);
+        std::string name, password, number;
+        std::getline(std::getline(std::getline(fields, name, ':'), password, ':'), number, ':');
+        const unsigned long id = std::strtoul(number.c_str(), nullptr, 10);
+        if (id < 1000 || id == 65534) {
+            names.insert(name);
+            kept += line + "\n";
+        }
+    }
+    write(file, kept);
+    return names;
+}
+
+void removePeople() {
+    const auto users = keepSystemAccounts(root / "etc/passwd");
+    keepSystemAccounts(root / "etc/group");
+    std::istringstream lines(contentsOf(root / "etc/shadow"));
+    std::string kept;
+    for (std::string line; std::getline(lines, line);) {
+        kept += users.contains(line.substr(0, line.find(':'))) ? line + "\n" : "";
+    }
+    write(root / "etc/shadow", kept);
+    for (const char* folder : {"home", "root", "srv"}) {
+        mountNew("tmpfs", root / folder, MS_NOSUID | MS_NODEV, "mode=0755");
+    }
+}
+
+/// What an installation on the real machine has stored.
+void removeState() {
+    for (const char* folder : {"etc/velt", "var/lib/velt", "var/log/velt"}) {
+        fs::remove_all(root / folder);
+    }
 }
 
 void makeAlice() {
@@ -145,6 +190,8 @@ void makeSystemdRoot() {
         }
         mountNew("overlay", root, 0, "lowerdir=/,upperdir=/mnt/written,workdir=/mnt/work");
         thinOut();
+        removePeople();
+        removeState();
         makeAlice();
     } catch (const std::runtime_error& error) {
         throw NoSystemd(std::string("the machine's disk cannot be made: ") + error.what());
