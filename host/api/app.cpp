@@ -1,6 +1,6 @@
 #include "host/api/app.h"
 
-#include "host/api/log.h"
+#include "host/api/log_page.h"
 #include "host/api/problem.h"
 #include "host/api/status.h"
 #include "host/api/tokens.h"

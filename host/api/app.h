@@ -2,7 +2,7 @@
 #ifndef VELT_HOST_API_APP_H
 #define VELT_HOST_API_APP_H
 
-#include "host/api/access.h"
+#include "host/api/access_control.h"
 #include "host/api/event_hub.h"
 #include "host/api/events.h"
 #include "host/api/metrics.h"
@@ -60,7 +60,7 @@ private:
 
     HostLog& log_;
     TokenStore tokens_;
-    Access access_;
+    AccessControl access_;
     OpenApi openApi_;
     Metrics metrics_;
     EventHub events_;

@@ -1,6 +1,6 @@
 #include "host/api/events.h"
 
-#include "host/api/log.h"
+#include "host/api/log_page.h"
 
 namespace velt::host {
 

@@ -1,4 +1,4 @@
-#include "host/api/access.h"
+#include "host/api/access_control.h"
 
 #include "host/api/problem.h"
 #include "host/base/account_names.h"
@@ -44,10 +44,11 @@ bool isForeignPage(const HttpRequest& head, const Peer& peer) {
 
 } // namespace
 
-Access::Access(AccessSettings settings, const TokenStore& tokens, HostLog& log)
+AccessControl::AccessControl(AccessSettings settings, const TokenStore& tokens, HostLog& log)
     : settings_(std::move(settings)), tokens_(tokens), log_(log) {}
 
-std::optional<Refusal> Access::check(const HttpRequest& head, const Peer& peer, Principal& principal) const {
+std::optional<Refusal> AccessControl::check(const HttpRequest& head, const Peer& peer,
+                                            Principal& principal) const {
     if (auto refusal = authenticate(head, peer, principal)) {
         return refusal;
     }
@@ -66,8 +67,8 @@ std::optional<Refusal> Access::check(const HttpRequest& head, const Peer& peer, 
     return std::nullopt;
 }
 
-std::optional<Refusal> Access::authenticate(const HttpRequest& head, const Peer& peer,
-                                            Principal& principal) const {
+std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, const Peer& peer,
+                                                   Principal& principal) const {
     principal.address = peer.address;
     if (head.authorization.empty()) {
         if (!peer.isUnixSocket) {
@@ -94,7 +95,7 @@ std::optional<Refusal> Access::authenticate(const HttpRequest& head, const Peer&
     return std::nullopt;
 }
 
-bool Access::isAdmin(const Peer& peer) const {
+bool AccessControl::isAdmin(const Peer& peer) const {
     if (peer.uid == 0 || peer.uid == geteuid()) {
         return true;
     }
@@ -102,7 +103,7 @@ bool Access::isAdmin(const Peer& peer) const {
     return admins && std::find(peer.groups.begin(), peer.groups.end(), *admins) != peer.groups.end();
 }
 
-bool Access::knowsHost(const std::string& host, const Peer& peer) const {
+bool AccessControl::knowsHost(const std::string& host, const Peer& peer) const {
     const auto [name, port] = splitHost(lowered(host));
     if (!port.empty() && port != std::to_string(peer.localPort)) {
         return false;
@@ -112,7 +113,7 @@ bool Access::knowsHost(const std::string& host, const Peer& peer) const {
            std::any_of(settings_.hostNames.begin(), settings_.hostNames.end(), isName);
 }
 
-Refusal Access::refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const {
+Refusal AccessControl::refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const {
     const std::string id = nextRequestId();
     log_.write(id, "access refused (" + std::to_string(status) + ") to " + peer.address + ": " + detail);
     Refusal refusal{problem(status, detail, id), delayed};

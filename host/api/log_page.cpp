@@ -1,4 +1,4 @@
-#include "host/api/log.h"
+#include "host/api/log_page.h"
 
 #include "host/api/problem.h"
 #include "host/base/clock.h"

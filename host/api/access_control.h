@@ -3,8 +3,8 @@
 // The kernel names the peer of a Unix socket: root, the host's own user and the members of the
 // administrators' group are admins. Everybody else needs a bearer token. What a page of another origin makes
 // a browser send is refused in any case.
-#ifndef VELT_HOST_API_ACCESS_H
-#define VELT_HOST_API_ACCESS_H
+#ifndef VELT_HOST_API_ACCESS_CONTROL_H
+#define VELT_HOST_API_ACCESS_CONTROL_H
 
 #include "host/api/token_store.h"
 #include "host/base/host_log.h"
@@ -23,10 +23,10 @@ struct AccessSettings {
 };
 
 /// Thread-safe.
-class Access {
+class AccessControl {
 public:
     /// The store and the log outlive it.
-    Access(AccessSettings settings, const TokenStore& tokens, HostLog& log);
+    AccessControl(AccessSettings settings, const TokenStore& tokens, HostLog& log);
 
     /// Fills `principal` and returns nothing when access is granted.
     std::optional<Refusal> check(const HttpRequest& head, const Peer& peer, Principal& principal) const;

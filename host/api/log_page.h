@@ -1,6 +1,6 @@
 // /api/log: the administrator log.
-#ifndef VELT_HOST_API_LOG_H
-#define VELT_HOST_API_LOG_H
+#ifndef VELT_HOST_API_LOG_PAGE_H
+#define VELT_HOST_API_LOG_PAGE_H
 
 #include "host/api/route.h"
 #include "standalone/standalone.h"
