@@ -1,6 +1,7 @@
 #include "host/config.h"
 
 #include "base/file.h"
+#include "host/api/token_store.h"
 #include "host/base/json.h"
 
 #include <algorithm>
@@ -258,7 +259,7 @@ std::filesystem::path Config::socketPath() const {
 }
 
 std::filesystem::path Config::tokenFile() const {
-    return stateRoot / "var/lib/velt/tokens.json";
+    return stateRoot / tokenFileName;
 }
 
 Config readConfig(const std::vector<std::string>& words) {

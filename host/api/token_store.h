@@ -15,6 +15,9 @@
 
 namespace velt::host {
 
+/// Where the tokens are below the state root.
+inline constexpr const char* tokenFileName = "var/lib/velt/tokens.json";
+
 /// The token file cannot be read or written; what() is a sentence for the administrator.
 class TokenError : public std::runtime_error {
 public:

@@ -1,18 +1,18 @@
 #include "host/trial/trial.h"
 
-#include "host/trial/first_files.h"
+#include "host/trial/credentials.h"
+#include "host/trial/first_state.h"
 #include "host/trial/report.h"
-#include "host/trial/set_up.h"
 #include "host/trial/trial_error.h"
 #include "host/trial/trial_folder.h"
 #include "host/trial/trial_place.h"
 #include "host/trial/trial_veltd.h"
+#include "standalone/standalone.h"
 
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <cstdio>
-#include <cstdlib>
+#include <exception>
 
 namespace velt::host {
 
@@ -20,63 +20,65 @@ namespace {
 
 constexpr int usageError = 2;
 
-/// Starts veltd, unless one of the latest build is running, and waits until it answers.
-void provideVeltd(const TrialFolder& folder, const TrialPlace& place, TrialRecord& record) {
-    const std::string build = buildOf(programFolder());
-    auto process = runningVeltd();
-    if (process && record.build != build) {
-        std::printf("veltd was built anew: it is started again.\n");
-        stopVeltd(folder.path());
-        process.reset();
-    }
-    if (process) {
-        std::printf("veltd runs already, as process %d.\n", static_cast<int>(*process));
-        waitForVeltd();
-        return;
-    }
-    linkPrograms();
-    makeFirstFiles(place.root);
-    // Stored before veltd runs, so that it is there if the start is interrupted.
-    record = {place.root, chooseHttpPort(record.httpPort), build, record.setUp};
-    folder.store(record);
-    const pid_t started = launchVeltd(folder.path(), place, record.httpPort);
-    std::printf("veltd runs, as process %d.\n", static_cast<int>(started));
-}
-
-/// A user who became root by sudo gets what is needed to go on without it.
-void giveToCaller() {
-    const char* const user = std::getenv("SUDO_UID"); // NOLINT(concurrency-mt-unsafe)
-    if (user == nullptr || ::geteuid() != 0) {
-        return;
-    }
-    const auto id = static_cast<uid_t>(std::strtoul(user, nullptr, 10));
-    for (const char* name : {".", environmentName, tokenName}) {
-        if (::lchown(name, id, static_cast<gid_t>(-1)) != 0) {
-            throw TrialError(std::string("Cannot give the file ") + name + " to the user who called sudo.");
-        }
-    }
-}
-
-void start(const TrialFolder& folder) {
-    const TrialPlace place = findPlace(folder.path());
+/// The record of the trial, which a new one has not yet.
+TrialRecord checkedRecord(const TrialFolder& folder, const TrialPlace& place) {
     TrialRecord record = folder.record();
     if (!record.place.empty() && record.place != place.root) {
         throw TrialError(folder.name() + " was made for " + record.place.string() + ", and this is " +
                          place.root.string() + ". Stop what runs and remove " + folder.name() +
                          " to begin anew.");
     }
-    provideVeltd(folder, place, record);
-    VeltdClient client(socketName);
-    const std::string token = provideToken(client);
-    if (!record.setUp) {
-        makeFirstSettings(client);
-        record.setUp = true;
+    return record;
+}
+
+/// Whether veltd runs, of this build and with this token; otherwise it and its services are stopped.
+bool runsAlready(bool sameBuild, bool hasToken) {
+    const auto process = runningVeltd();
+    if (process && !(sameBuild && hasToken)) {
+        std::printf("%s: it is started again.\n",
+                    sameBuild ? "veltd needs a new token" : "veltd was built anew");
+        endVeltd();
+        check(stopServices());
+        return false;
+    }
+    // One that was killed may take a moment to end.
+    if (!process || !waitForVeltd()) {
+        return false;
+    }
+    std::printf("veltd runs already, as process %d.\n", static_cast<int>(*process));
+    return true;
+}
+
+void start(const TrialFolder& folder) {
+    const TrialPlace place = findPlace(folder.path());
+    TrialRecord record = checkedRecord(folder, place);
+    const std::filesystem::path programs = programFolder();
+    const std::string build = buildOf(programs);
+    check(openState(folder.path()));
+    auto token = storedToken();
+    if (!runsAlready(record.build == build, token.has_value())) {
+        linkPrograms();
+        if (record.place.empty()) {
+            makeFirstState(place.root);
+        }
+        if (!token) {
+            token = makeToken();
+        }
+        // Stored before veltd runs, so that it is there if the start is interrupted.
+        record = {place.root, chooseHttpPort(record.httpPort), build};
         folder.store(record);
+        const pid_t started = launchVeltd(folder.path(), place, record.httpPort);
+        std::printf("veltd runs, as process %d.\n", static_cast<int>(started));
     }
     const std::string url = "http://127.0.0.1:" + std::to_string(record.httpPort);
-    writeEnvironment(url, token, programFolder());
-    giveToCaller();
-    report(client, folder.name(), url, token);
+    writeEnvironment(url, *token, programs);
+    report(folder.name(), url, *token);
+}
+
+void stop(const TrialFolder& folder) {
+    endVeltd();
+    check(openState(folder.path()));
+    check(stopServices());
 }
 
 } // namespace
@@ -90,13 +92,13 @@ int runTrial(const std::vector<std::string>& words) {
             return 0;
         }
         if (words.size() == 2 && words[0] == "stop") {
-            stopVeltd(TrialFolder::forStop(words[1]).path());
+            stop(TrialFolder::forStop(words[1]));
             return 0;
         }
         std::fprintf(stderr, "Usage: veltd trial start FOLDER\n"
                              "       veltd trial stop FOLDER\n");
         return usageError;
-    } catch (const TrialError& error) {
+    } catch (const std::exception& error) {
         std::fprintf(stderr, "%s\n", error.what());
         return 1;
     }

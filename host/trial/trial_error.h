@@ -12,19 +12,20 @@ namespace velt::host {
 class TrialError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
+    explicit TrialError(const Error& error) : std::runtime_error(error.message) {}
 };
 
 /// The value, when there is one. Throws TrialError.
 template<class Value> Value valueOf(Result<Value> result) {
     if (!result) {
-        throw TrialError(result.error().message);
+        throw TrialError(result.error());
     }
     return std::move(*result);
 }
 
 inline void check(const Result<>& result) {
     if (!result) {
-        throw TrialError(result.error().message);
+        throw TrialError(result.error());
     }
 }
 

@@ -9,12 +9,11 @@
 
 namespace velt::host {
 
-/// What is stored about a trial.
+/// What is stored about a trial once its first state is made.
 struct TrialRecord {
     std::filesystem::path place; ///< the state root as veltd sees it; "" for a new trial
     int httpPort = 0;            ///< 0 for a new trial
     std::string build;           ///< identifies the programs that were started
-    bool setUp = false;          ///< its first settings are made
 };
 
 /// The trial while it is started or stopped, which its lock allows one process at a time. Makes the folder
@@ -26,7 +25,7 @@ public:
     static TrialFolder forStart(const std::filesystem::path& folder);
     static TrialFolder forStop(const std::filesystem::path& folder);
 
-    /// The folder as it was named, for messages.
+    /// The folder as it was named, with a slash at its end, for messages.
     const std::string& name() const { return name_; }
     const std::filesystem::path& path() const { return path_; }
 

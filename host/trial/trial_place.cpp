@@ -1,5 +1,6 @@
 #include "host/trial/trial_place.h"
 
+#include "base/ask_child.h"
 #include "host/trial/trial_error.h"
 
 #include <grp.h>
@@ -7,10 +8,7 @@
 #include <sched.h>
 #include <sys/mount.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
-
-#include <functional>
 
 namespace velt::host {
 
@@ -19,27 +17,18 @@ namespace {
 constexpr const char* mountPoint = "/media";
 constexpr const char* mountedRoot = "/media/velt";
 
-/// Runs the test in a child process, which it may change.
-bool holdsInChild(const std::function<bool()>& test) {
-    const pid_t child = ::fork();
-    if (child == 0) {
-        ::_exit(test() ? 0 : 1);
-    }
-    int status = 1;
-    return child > 0 && ::waitpid(child, &status, 0) == child && status == 0;
-}
-
 bool mayEnter(const passwd& account, const std::filesystem::path& folder) {
-    return holdsInChild([&] {
+    const auto answer = askChild([&] {
         return ::setgroups(0, nullptr) == 0 && ::setgid(account.pw_gid) == 0 &&
                ::setuid(account.pw_uid) == 0 && ::access(folder.c_str(), X_OK) == 0;
     });
+    return answer == 1;
 }
 
 } // namespace
 
 bool mayMount() {
-    return holdsInChild([] { return ::unshare(CLONE_NEWNS) == 0; });
+    return askChild([] { return ::unshare(CLONE_NEWNS) == 0 ? 1 : 0; }) == 1;
 }
 
 TrialPlace findPlace(const std::filesystem::path& folder) {

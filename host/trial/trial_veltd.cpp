@@ -2,27 +2,28 @@
 
 #include "base/file.h"
 #include "base/sha256.h"
+#include "base/text.h"
 #include "host/base/instance_lock.h"
 #include "host/http/listener.h"
 #include "host/trial/trial_error.h"
-#include "standalone/standalone.h"
 
 #include <fcntl.h>
 #include <poll.h>
+#include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/un.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <array>
-#include <cerrno>
 #include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <functional>
+#include <string_view>
 #include <system_error>
 #include <thread>
-#include <vector>
 
 extern "C" { // missing in the header of glibc 2.36
 #include <sys/pidfd.h>
@@ -33,6 +34,7 @@ namespace velt::host {
 namespace {
 
 constexpr const char* logName = "veltd.log";
+constexpr const char* socketName = "run/velt/veltd.sock";
 constexpr const char* moduleName = "VELT.Core.FileServ.FTP.so";
 constexpr std::array<const char*, 7> programNames{"veltd",
                                                   "veltctl",
@@ -44,36 +46,28 @@ constexpr std::array<const char*, 7> programNames{"veltd",
 constexpr int firstHttpPort = 8080;
 constexpr int lastHttpPort = 8099;
 
-std::string systemError() {
-    return std::generic_category().message(errno);
+/// Whether veltd gives an answer, which it does once the enabled services are started.
+bool answers() {
+    constexpr std::string_view request = "GET /healthz HTTP/1.1\r\nHost: localhost\r\n\r\n";
+    sockaddr_un address{AF_UNIX, {}};
+    std::string_view(socketName).copy(static_cast<char*>(address.sun_path), sizeof address.sun_path - 1);
+    const void* const name = &address;
+    const UniqueFd socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    char first = 0;
+    return ::connect(socket.get(), static_cast<const sockaddr*>(name), sizeof address) == 0 &&
+           ::send(socket.get(), request.data(), request.size(), MSG_NOSIGNAL) > 0 &&
+           ::recv(socket.get(), &first, 1, 0) == 1;
 }
 
-/// The last lines of veltd's log.
-std::string lastLogLines() {
-    constexpr int wanted = 3;
-    const auto file = readFile(logName);
-    std::string text = file ? *file : file.error().message;
-    text.erase(text.find_last_not_of('\n') + 1);
-    std::size_t begin = text.size() + 1;
-    for (int i = 0; i < wanted && begin > 0; ++i) {
-        begin = begin < 2 ? 0 : text.rfind('\n', begin - 2) + 1;
-    }
-    return text.substr(begin);
-}
-
-void waitForAnswer(const std::function<bool()>& runs) {
-    const VeltdClient client(socketName);
-    while (true) {
-        try {
-            client.get("/healthz");
-            return;
-        } catch (const TrialError&) {
-            if (!runs()) {
-                throw TrialError("veltd did not start:\n" + lastLogLines());
-            }
+/// Waits until veltd answers. False when it ends before.
+bool waitForAnswer(const std::function<bool()>& runs) {
+    while (!answers()) {
+        if (!runs()) {
+            return false;
         }
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
     }
+    return true;
 }
 
 /// Becomes veltd, in a session of its own: what ends the starting process does not end it.
@@ -92,7 +86,7 @@ void waitForAnswer(const std::function<bool()>& runs) {
     }
     lock->keepOverExec();
     if (place.needsMounts && !mountPlace(folder, place)) {
-        std::fprintf(stderr, "Cannot mount %s: %s.\n", place.root.c_str(), systemError().c_str());
+        std::fprintf(stderr, "%s\n", cannot("mount", place.root).message.c_str());
         ::_exit(1);
     }
     const std::filesystem::path programs = programFolder();
@@ -102,21 +96,16 @@ void waitForAnswer(const std::function<bool()>& runs) {
     const std::string address = "127.0.0.1:" + std::to_string(httpPort);
     ::execl(program.c_str(), "veltd", "--state-root", place.root.c_str(), "--module", module.c_str(),
             "--listen", address.c_str(), "--socket", socketName, nullptr);
-    std::fprintf(stderr, "Cannot run %s: %s.\n", program.c_str(), systemError().c_str());
+    std::fprintf(stderr, "%s\n", cannot("run", program).message.c_str());
     ::_exit(1);
 }
 
-/// Ends the process that holds the lock, and waits for it.
-void endVeltd(pid_t process) {
-    constexpr int longestEnd = 70'000;
-    const UniqueFd handle(::pidfd_open(process, 0));
-    // The handle is of this process, and not of a later one with the same number, if it still holds the lock.
-    if (!handle || runningVeltd() != process) {
-        return;
-    }
-    pollfd ended{handle.get(), POLLIN, 0};
-    if (::pidfd_send_signal(handle.get(), SIGTERM, nullptr, 0) != 0 || ::poll(&ended, 1, longestEnd) != 1) {
-        throw TrialError("veltd, process " + std::to_string(process) + ", does not end.");
+bool isFree(int port) {
+    try {
+        Listener::tcp("127.0.0.1:" + std::to_string(port), false);
+        return true;
+    } catch (const ListenError&) {
+        return false;
     }
 }
 
@@ -158,43 +147,44 @@ void linkPrograms() {
 pid_t launchVeltd(const std::filesystem::path& folder, const TrialPlace& place, int httpPort) {
     const pid_t child = ::fork();
     if (child < 0) {
-        throw TrialError("Cannot start a process: " + systemError() + ".");
+        throw TrialError(cannot("start", "veltd"));
     }
     if (child == 0) {
         becomeVeltd(folder, place, httpPort);
     }
-    waitForAnswer([child] { return ::waitpid(child, nullptr, WNOHANG) == 0; });
+    if (!waitForAnswer([child] { return ::waitpid(child, nullptr, WNOHANG) == 0; })) {
+        const auto log = readFile(logName);
+        throw TrialError("veltd did not start:\n" +
+                         std::string(trimmedEnd(log ? *log : log.error().message, "\n")));
+    }
     return child;
 }
 
-void waitForVeltd() {
-    waitForAnswer([] { return runningVeltd().has_value(); });
+bool waitForVeltd() {
+    return waitForAnswer([] { return runningVeltd().has_value(); });
 }
 
-void stopVeltd(const std::filesystem::path& folder) {
-    if (const auto process = runningVeltd()) {
-        endVeltd(*process);
+void endVeltd() {
+    constexpr int longestEnd = 70'000;
+    const auto process = runningVeltd();
+    const UniqueFd handle(process ? ::pidfd_open(*process, 0) : -1);
+    // The handle is of this process, and not of a later one with the same number, if it still holds the lock.
+    if (!handle || runningVeltd() != process) {
+        return;
     }
-    const auto opened = openState(folder);
-    if (const auto stopped = opened ? stopServices() : opened; !stopped) {
-        throw TrialError(stopped.error().message);
+    pollfd ended{handle.get(), POLLIN, 0};
+    if (::pidfd_send_signal(handle.get(), SIGTERM, nullptr, 0) != 0 || ::poll(&ended, 1, longestEnd) != 1) {
+        throw TrialError("veltd, process " + std::to_string(*process) + ", does not end.");
     }
 }
 
 int chooseHttpPort(int former) {
-    std::vector<int> candidates;
-    if (former != 0) {
-        candidates.push_back(former);
+    if (former != 0 && isFree(former)) {
+        return former;
     }
     for (int port = firstHttpPort; port <= lastHttpPort; ++port) {
-        candidates.push_back(port);
-    }
-    for (const int port : candidates) {
-        try {
-            Listener::tcp("127.0.0.1:" + std::to_string(port), false);
+        if (isFree(port)) {
             return port;
-        } catch (const ListenError&) {
-            continue;
         }
     }
     throw TrialError("The ports " + std::to_string(firstHttpPort) + " to " + std::to_string(lastHttpPort) +
