@@ -24,7 +24,7 @@
 #include "standalone/journal/subscriptions.h"
 
 // The calling thread's last error in a sentence.
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 // Listing effects instead of doing them, or failing them; hearing which were done, with what result and in
 // what time. Undoing is not in here: a host that wants it keeps what was before, and sets that again.

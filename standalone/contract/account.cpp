@@ -1,7 +1,7 @@
 #include "platform/account.h"
 
 #include "standalone/accounts/user_directory.h"
-#include "standalone/core/boundary.h"
+#include "standalone/contract/boundary.h"
 
 #include <limits>
 #include <map>

@@ -1,6 +1,6 @@
 #include "platform/adminlog.h"
 
-#include "standalone/core/boundary.h"
+#include "standalone/contract/boundary.h"
 #include "standalone/journal/admin_log.h"
 
 int VELTLogSet1(int category, int level, unsigned event, const char* arg1, const char* arg2, const char* arg3,

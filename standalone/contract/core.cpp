@@ -1,11 +1,11 @@
 #include "platform/core.h"
 
+#include "standalone/contract/boundary.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/contract/string_map.h"
 #include "standalone/control/change_settings.h"
-#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"

@@ -1,7 +1,7 @@
 #include "platform/firewall.h"
 
+#include "standalone/contract/boundary.h"
 #include "standalone/control/service_firewall.h"
-#include "standalone/core/boundary.h"
 
 int VELTFwRuleHup(void) {
     return velt::atBoundary(velt::openServicePorts);

@@ -1,8 +1,8 @@
 #include "ftp/ftp_library.h"
 
+#include "standalone/contract/boundary.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/control/change_settings.h"
-#include "standalone/core/boundary.h"
-#include "standalone/core/last_error.h"
 #include "standalone/rules/chroot_users.h"
 #include "standalone/rules/rule_store.h"
 #include "standalone/settings/record_merge.h"

@@ -1,7 +1,7 @@
 #include "platform/sdk_user.h"
 
 #include "standalone/accounts/user_directory.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 #include <memory>
 #include <new>

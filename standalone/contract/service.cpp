@@ -2,9 +2,9 @@
 
 #include "base/file.h"
 #include "platform/sftp.h"
+#include "standalone/contract/boundary.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/supervised_daemon.h"
-#include "standalone/core/boundary.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"

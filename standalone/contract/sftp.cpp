@@ -1,8 +1,8 @@
 // The contract's operations on the SFTP settings.
 #include "platform/sftp.h"
+#include "standalone/contract/boundary.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/control/change_settings.h"
-#include "standalone/core/boundary.h"
-#include "standalone/core/last_error.h"
 #include "standalone/settings/record_merge.h"
 
 namespace velt {

@@ -1,7 +1,7 @@
 #include "platform/share.h"
 
 #include "base/plain_text.h"
-#include "standalone/core/boundary.h"
+#include "standalone/contract/boundary.h"
 #include "standalone/shares/share_access.h"
 #include "standalone/shares/share_store.h"
 

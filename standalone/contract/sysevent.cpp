@@ -1,7 +1,7 @@
 #include "platform/sysevent.h"
 
+#include "standalone/contract/boundary.h"
 #include "standalone/contract/string_map.h"
-#include "standalone/core/boundary.h"
 #include "standalone/journal/announce.h"
 
 int VLIBSyseventEmit(const char* event, VLIBCSzHash* params, int /*flags*/) {

@@ -1,7 +1,7 @@
 #include "platform/webapi.h"
 
+#include "standalone/contract/boundary.h"
 #include "standalone/contract/last_port_conflict.h"
-#include "standalone/core/boundary.h"
 
 namespace velt {
 namespace {

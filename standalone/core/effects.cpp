@@ -1,7 +1,5 @@
 #include "standalone/core/effects.h"
 
-#include "standalone/core/last_error.h"
-
 #include <utility>
 
 namespace velt {
@@ -65,15 +63,6 @@ Result<> perform(Effect effect, std::string_view subject, const std::function<Re
     const EffectHook hook = threadHook();
     const EffectDecision decision = hook ? hook(effect, subject) : std::nullopt;
     return decision ? *decision : actAndReport(effect, subject, act);
-}
-
-int perform(Effect effect, std::string_view subject, const std::function<int()>& act) {
-    const auto outcome = perform(effect, subject, [&act]() -> Result<> {
-        if (act() < 0)
-            return lastErrorAsValue();
-        return {};
-    });
-    return outcome ? 0 : fail(outcome.error());
 }
 
 void setEffectHook(EffectHook hook) {

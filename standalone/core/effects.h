@@ -30,9 +30,6 @@ std::string_view effectName(Effect effect);
 /// report, when there is one, is told after.
 Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act);
 
-/// The same for an act that sets the last error.
-int perform(Effect effect, std::string_view subject, const std::function<int()>& act);
-
 /// What a hook decides about one effect: nothing, so that it is done, or the outcome of leaving it undone.
 using EffectDecision = std::optional<Result<>>;
 using EffectHook = std::function<EffectDecision(Effect effect, std::string_view subject)>;

@@ -3,7 +3,6 @@
 #include "base/file.h"
 #include "base/file_lock.h"
 #include "base/unique_fd.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
@@ -52,15 +51,7 @@ Result<StateLock> StateLock::take() {
         lock.file = std::move(*file);
     }
     ++lock.depth;
-    return StateLock(true);
-}
-
-StateLock::StateLock() {
-    auto lock = take();
-    if (lock)
-        held_ = std::exchange(lock->held_, false);
-    else
-        fail(lock.error());
+    return StateLock();
 }
 
 StateLock::~StateLock() {

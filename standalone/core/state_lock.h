@@ -14,19 +14,14 @@ class StateLock {
 public:
     static Result<StateLock> take();
 
-    /// As take; with the last error set when the lock cannot be had.
-    StateLock();
     ~StateLock();
     StateLock(StateLock&& other) noexcept : held_(std::exchange(other.held_, false)) {}
     StateLock& operator=(StateLock&&) = delete;
 
-    /// False when the lock cannot be had (the last error says why).
-    explicit operator bool() const { return held_; }
-
 private:
-    explicit StateLock(bool held) : held_(held) {}
+    StateLock() = default;
 
-    bool held_ = false;
+    bool held_ = true; ///< false once it was moved away
 };
 
 } // namespace velt

@@ -1,6 +1,6 @@
 #include "standalone/supervise/daemon_process.h"
 
-#include "base/spawn_setup.h"
+#include "base/spawning.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/listening_sockets.h"
 
@@ -37,12 +37,10 @@ std::string listPorts(const std::vector<int>& ports) {
 } // namespace
 
 DaemonProcess::DaemonProcess() {
-    std::array<int, 2> ends{-1, -1};
-    if (::pipe2(ends.data(), O_CLOEXEC) == 0) {
-        readEnd_ = UniqueFd(ends[0]);
-        writeEnd_ = UniqueFd(ends[1]);
+    if (auto pipe = makePipe()) {
+        output_ = std::move(*pipe);
         // Only the reading side: a daemon does not expect its standard error to refuse a line.
-        ::fcntl(readEnd_.get(), F_SETFL, O_NONBLOCK);
+        ::fcntl(output_.readEnd.get(), F_SETFL, O_NONBLOCK);
     }
 }
 
@@ -58,26 +56,16 @@ Result<> DaemonProcess::spawn(const DaemonOrder& order) {
     if (order.arguments.empty()) {
         return Error("there is no program to start");
     }
-    std::vector<char*> arguments;
-    for (const std::string& argument : order.arguments) {
-        arguments.push_back(const_cast<char*>(argument.c_str()));
-    }
-    arguments.push_back(nullptr);
-    std::string path = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
-    std::string language = "LANG=C.UTF-8";
-    std::array<char*, 3> environment{path.data(), language.data(), nullptr};
-    SpawnSetup setup;
-    ::posix_spawn_file_actions_addopen(&setup.actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_.get(), STDOUT_FILENO);
-    ::posix_spawn_file_actions_adddup2(&setup.actions, writeEnd_.get(), STDERR_FILENO);
-    pid_t pid = 0;
-    const int error = ::posix_spawn(&pid, arguments[0], &setup.actions, &setup.attributes, arguments.data(),
-                                    environment.data());
-    if (error != 0) {
-        return Error("cannot start " + order.arguments[0] + ": " + std::strerror(error));
+    Spawn program;
+    program.open("/dev/null", O_RDONLY, STDIN_FILENO);
+    program.pass(output_.writeEnd.get(), STDOUT_FILENO);
+    program.pass(output_.writeEnd.get(), STDERR_FILENO);
+    const auto pid = program.start(order.arguments);
+    if (!pid) {
+        return pid.error();
     }
     // A child that has ended already cannot be identified any more, but keeps its pid until it is reaped.
-    id_ = identifyProcess(pid).value_or(ProcessId{pid, 0});
+    id_ = identifyProcess(*pid).value_or(ProcessId{*pid, 0});
     return {};
 }
 
@@ -100,7 +88,7 @@ Result<> DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::time
             return Error("it did not listen on port " + listPorts(order.ports) + " in time" +
                          (words.empty() ? "" : ": " + words));
         }
-        pollfd output{readEnd_.get(), POLLIN, 0};
+        pollfd output{output_.readEnd.get(), POLLIN, 0};
         ::poll(&output, 1, 2);
     }
 }
@@ -130,7 +118,7 @@ std::string DaemonProcess::takeLastWords() {
 void DaemonProcess::readOutput() {
     std::array<char, 4096> buffer{};
     for (;;) {
-        const ssize_t length = ::read(readEnd_.get(), buffer.data(), buffer.size());
+        const ssize_t length = ::read(output_.readEnd.get(), buffer.data(), buffer.size());
         if (length <= 0) {
             return;
         }

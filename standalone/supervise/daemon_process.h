@@ -2,8 +2,8 @@
 #ifndef VELT_STANDALONE_SUPERVISE_DAEMON_PROCESS_H
 #define VELT_STANDALONE_SUPERVISE_DAEMON_PROCESS_H
 
+#include "base/pipe.h"
 #include "base/result.h"
-#include "base/unique_fd.h"
 #include "standalone/process/process_identity.h"
 #include "standalone/supervise/daemon_order.h"
 
@@ -32,7 +32,7 @@ public:
     Error ended(int waitStatus);
 
     /// Becomes readable when the daemon has written something, which readOutput() then takes.
-    int outputDescriptor() const { return readEnd_.get(); }
+    int outputDescriptor() const { return output_.readEnd.get(); }
     void readOutput();
 
 private:
@@ -41,8 +41,7 @@ private:
     std::string takeLastWords();
     void takeLine(std::string line);
 
-    UniqueFd readEnd_;
-    UniqueFd writeEnd_; ///< kept, so that the read end never sees an end of file
+    Pipe output_; ///< with its write end, so that the read end never sees an end of file
     ProcessId id_;
     std::string partialLine_;
     std::deque<std::string> lastLines_;

@@ -1,8 +1,8 @@
 // The platform of an ordinary server below a temporary state root. No daemon is started; the daemons' own
 // tests of a configuration are the real ones.
 #include "standalone/accounts/account_sources.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/contract/string_map.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_store.h"
 #include "standalone/standalone.h"

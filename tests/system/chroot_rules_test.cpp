@@ -1,7 +1,7 @@
 // The chroot rules at logins.
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "tests/support/result.h"
 
 #include <sys/stat.h>

@@ -1,7 +1,7 @@
 // Where local and anonymous users may go.
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/support/text.h"

@@ -1,7 +1,7 @@
 // Time-out, rates, connections, file names and file contents.
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "tests/support/files.h"
 #include "tests/support/text.h"
 #include "tests/support/waiting.h"

@@ -1,7 +1,7 @@
 // What a plan says, and when it changes.
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"

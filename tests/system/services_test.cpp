@@ -2,7 +2,7 @@
 #include "ftp/ftp_library.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/process/run_program.h"
 #include "standalone/standalone.h"

@@ -1,6 +1,6 @@
 // The SFTP service with real clients.
 #include "platform/sftp.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/process/run_program.h"

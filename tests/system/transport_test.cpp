@@ -1,7 +1,7 @@
 // Ports, addresses and encryption.
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "tests/support/files.h"
 #include "tests/support/text.h"

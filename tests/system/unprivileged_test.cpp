@@ -1,7 +1,7 @@
 // The FTP service without root's rights: accounts of its own files, one user's rights for all of them.
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "tests/support/result.h"

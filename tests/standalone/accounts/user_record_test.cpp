@@ -2,7 +2,7 @@
 #include "platform/core.h"
 #include "platform/sdk_user.h"
 #include "standalone/accounts/account_sources.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>

@@ -1,8 +1,8 @@
 // The chroot operations of the contract over accounts and a state root of their own.
 #include "ftp/ftp_library.h"
 #include "standalone/accounts/account_sources.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/rules/rule_store.h"
 #include "tests/support/result.h"

@@ -1,7 +1,7 @@
 #include "ftp/ftp_library.h"
 #include "platform/core.h"
 #include "platform/share.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_store.h"
 #include "tests/support/result.h"

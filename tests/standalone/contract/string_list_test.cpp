@@ -1,5 +1,5 @@
 #include "platform/core.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 #include "standalone/contract/string_map.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 #include <gtest/gtest.h>
 

@@ -5,7 +5,7 @@
 #include "platform/service.h"
 #include "platform/sftp.h"
 #include "platform/webapi.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/control/plan_double.h"

@@ -2,11 +2,11 @@
 // stand-in, which starts and ends real supervisors.
 
 #include "base/file.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/control/systemd_launcher.h"
 #include "standalone/control/systemd_unit.h"
 #include "standalone/core/installed_files.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/process/run_program.h"
 #include "tests/standalone/supervise/daemon_test.h"

@@ -1,7 +1,7 @@
 #include "standalone/core/key_value_file.h"
 
 #include "platform/core.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "tests/standalone/support/state_folder.h"
 #include "tests/support/result.h"
 

@@ -5,8 +5,8 @@
 #include "platform/firewall.h"
 #include "platform/service.h"
 #include "platform/sftp.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
@@ -172,7 +172,8 @@ TEST_F(FirewallTest, RulesThatCannotBeLoadedKeepNoServiceDown) {
 }
 
 TEST_F(FirewallTest, SettingsInTheMiddleOfAChangeAreWaitedFor) {
-    std::optional<StateLock> change(std::in_place);
+    std::optional<Result<StateLock>> change(StateLock::take());
+    ASSERT_TRUE(*change);
     std::atomic<bool> done = false;
     std::thread loader([&done] {
         EXPECT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();

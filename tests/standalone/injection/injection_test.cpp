@@ -4,7 +4,7 @@
 #include "platform/service.h"
 #include "platform/sftp.h"
 #include "standalone/accounts/account_sources.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/settings/settings.h"
 #include "standalone/shares/share_store.h"
 #include "tests/standalone/support/state_folder.h"

@@ -1,7 +1,7 @@
 #include "platform/core.h"
 #include "platform/sysevent.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/journal/event_file.h"
 #include "standalone/standalone.h"

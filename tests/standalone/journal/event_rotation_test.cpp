@@ -1,7 +1,7 @@
 // The event files over a long time, with several writers, and after crashes.
 #include "platform/sysevent.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/contract/string_map.h"
-#include "standalone/core/last_error.h"
 #include "standalone/journal/event_file.h"
 #include "tests/standalone/support/state_folder.h"
 

@@ -1,5 +1,5 @@
 #include "platform/adminlog.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/support/process.h"

@@ -1,7 +1,7 @@
 #include "standalone/journal/log_retention.h"
 
 #include "platform/adminlog.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 #include "tests/support/result.h"

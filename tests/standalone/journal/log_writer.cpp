@@ -1,6 +1,6 @@
 // log-writer ROOT NAME COUNT: logs COUNT entries for the user NAME. Exit code 0 when each was stored.
 #include "platform/adminlog.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/standalone.h"
 

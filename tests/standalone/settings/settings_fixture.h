@@ -2,8 +2,8 @@
 #ifndef VELT_TESTS_STANDALONE_SETTINGS_SETTINGS_FIXTURE_H
 #define VELT_TESTS_STANDALONE_SETTINGS_SETTINGS_FIXTURE_H
 
+#include "standalone/contract/last_error.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "tests/standalone/settings/fake_candidate.h"
 #include "tests/standalone/support/state_folder.h"
 

@@ -1,8 +1,8 @@
 #include "standalone/shares/share_store.h"
 
 #include "platform/core.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "tests/support/result.h"
@@ -105,7 +105,7 @@ TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
     constexpr int each = 20;
     const auto addAll = [](const std::string& prefix) {
         for (int i = 0; i < each; ++i) {
-            const StateLock lock;
+            const auto lock = StateLock::take();
             auto shares = loadShares();
             if (!lock || !shares) {
                 return 1;

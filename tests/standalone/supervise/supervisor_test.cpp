@@ -1,7 +1,7 @@
 // velt-supervise with a real daemon, driven as the services drive it.
 
+#include "standalone/contract/last_error.h"
 #include "standalone/control/supervised_daemon.h"
-#include "standalone/core/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/process/listening_sockets.h"
 #include "tests/standalone/supervise/daemon_test.h"

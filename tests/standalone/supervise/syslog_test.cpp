@@ -1,7 +1,7 @@
 // Under which names the daemons' words are found in the system's log.
 #include "base/unique_fd.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/control/supervised_daemon.h"
-#include "standalone/core/last_error.h"
 #include "tests/standalone/supervise/daemon_test.h"
 #include "tests/support/ports.h"
 

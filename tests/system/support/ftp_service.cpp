@@ -1,6 +1,6 @@
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "tests/support/result.h"

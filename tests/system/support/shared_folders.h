@@ -4,7 +4,7 @@
 
 #include "tests/system/support/ftp_service.h"
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "tests/support/result.h"
 
 #include <sys/stat.h>

@@ -2,7 +2,7 @@
 
 #include "ftp/ftp_library.h"
 #include "platform/sftp.h"
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 #include "standalone/standalone.h"
 #include "tests/support/result.h"
 #include "tests/support/waiting.h"

@@ -1,4 +1,4 @@
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 #include "platform/core.h"
 

@@ -1,8 +1,8 @@
 // Where the library's C++ ends and the contract's C begins.
-#ifndef VELT_STANDALONE_CORE_BOUNDARY_H
-#define VELT_STANDALONE_CORE_BOUNDARY_H
+#ifndef VELT_STANDALONE_CONTRACT_BOUNDARY_H
+#define VELT_STANDALONE_CONTRACT_BOUNDARY_H
 
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 #include <exception>
 #include <new>

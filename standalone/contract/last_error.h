@@ -1,10 +1,9 @@
 // The calling thread's last error: what VLIBCErrGet and its siblings report, and a sentence for people.
-#ifndef VELT_STANDALONE_CORE_LAST_ERROR_H
-#define VELT_STANDALONE_CORE_LAST_ERROR_H
+#ifndef VELT_STANDALONE_CONTRACT_LAST_ERROR_H
+#define VELT_STANDALONE_CONTRACT_LAST_ERROR_H
 
 #include "standalone/core/error_number.h"
 
-#include <optional>
 #include <string>
 
 namespace velt {
@@ -15,18 +14,6 @@ int fail(ErrorNumber number, std::string sentence, SourcePlace where = SourcePla
 
 /// Records the error for the calling thread and returns -1.
 int fail(const Error& error);
-
-/// The calling thread's last error as a value.
-Error lastErrorAsValue();
-
-/// The value; or nothing, with the calling thread's last error set, for callers that do not give a Result
-/// yet.
-template<class Value> std::optional<Value> orLastError(Result<Value> result) {
-    if (result)
-        return *std::move(result);
-    fail(result.error());
-    return std::nullopt;
-}
 
 /// The kind of the calling thread's last error; none when there was none.
 ErrorNumber lastErrorNumber();

@@ -1,4 +1,4 @@
-#include "standalone/core/last_error.h"
+#include "standalone/contract/last_error.h"
 
 #include <string_view>
 #include <utility>
@@ -40,10 +40,6 @@ int fail(ErrorNumber number, std::string sentence, SourcePlace where) {
 int fail(const Error& error) {
     return fail(error.number == ErrorNumber::none ? ErrorNumber::store : error.number, error.message,
                 error.where);
-}
-
-Error lastErrorAsValue() {
-    return {lastError().number, lastError().sentence, lastErrorPlace()};
 }
 
 ErrorNumber lastErrorNumber() {
