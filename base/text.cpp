@@ -11,6 +11,13 @@ std::string_view trimmedEnd(std::string_view text, std::string_view characters) 
     return text.substr(0, text.find_last_not_of(characters) + 1);
 }
 
+std::string lowerCase(std::string_view text) {
+    std::string lower(text);
+    for (char& c : lower)
+        c = c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+    return lower;
+}
+
 std::string_view cut(std::string_view& rest, char separator) {
     const std::size_t end = rest.find(separator);
     const std::string_view head = rest.substr(0, end);

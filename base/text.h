@@ -2,6 +2,7 @@
 #ifndef VELT_BASE_TEXT_H
 #define VELT_BASE_TEXT_H
 
+#include <string>
 #include <string_view>
 
 namespace velt {
@@ -13,6 +14,9 @@ std::string_view trimmed(std::string_view text);
 
 /// The text without those of the characters that it ends in.
 std::string_view trimmedEnd(std::string_view text, std::string_view characters);
+
+/// The text with the letters A to Z as small ones.
+std::string lowerCase(std::string_view text);
 
 /// Cuts the text before the first `separator` off `rest`, which becomes what follows it; "" when nothing
 /// does.

@@ -39,7 +39,7 @@ Json::Value ApiClient::exchange(const std::string& method, const std::string& pa
     if (answer.status != 200 && answer.status != 201) {
         throw failureFrom(answer, server(), method == "GET");
     }
-    const std::optional<Json::Value> value = parseJson(answer.body);
+    const auto value = parseJson(answer.body);
     if (!value) {
         throw Failure(ExitCode::access, "The answer from " + server().name() + " is not JSON.", checkAddress);
     }

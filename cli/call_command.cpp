@@ -40,11 +40,11 @@ void callMethod(Context& context, const CallOptions& options) {
                       "See 'veltctl call --list' for the methods.");
     }
     const std::string text = options.parameters == "-" ? readInput(context.console, "-") : options.parameters;
-    std::string reason;
-    const std::optional<Json::Value> parameters = parseJson(text, &reason);
+    const auto parameters = parseJson(text);
     if (!parameters || !parameters->isObject()) {
         throw Failure(ExitCode::usage, "The parameters are not a JSON object.",
-                      "Pass an object such as '{\"enable_ftp\": true}', quoted for the shell.", {reason});
+                      "Pass an object such as '{\"enable_ftp\": true}', quoted for the shell.",
+                      {parameters ? "" : parameters.error().message});
     }
     const Json::Value answer = context.api.call(options.method, *parameters);
     if (!answer.isNull()) {

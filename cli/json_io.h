@@ -1,20 +1,16 @@
-// JSON values from text and to text.
+// JSON values as commands read and write them.
 #ifndef VELT_CLI_JSON_IO_H
 #define VELT_CLI_JSON_IO_H
 
+#include "base/json_text.h"
 #include "cli/console.h"
 
 #include <json/value.h>
 
 #include <iosfwd>
-#include <optional>
 #include <string>
 
 namespace velt::cli {
-
-/// The value of a JSON text, strictly parsed. Nothing for any other text; `reason`, when given, then says
-/// what is wrong with it, as "line 1, column 5: ...".
-std::optional<Json::Value> parseJson(const std::string& text, std::string* reason = nullptr);
 
 /// The value of a JSON file, or of the standard input for "-". Failure when it cannot be read (usage) or is
 /// not JSON (refused).

@@ -110,7 +110,7 @@ public:
     }
 
     void take(const std::string& event, const std::string& data) {
-        const Json::Value entry = parseJson(data).value_or(Json::Value());
+        const Json::Value entry = parseJson(data).valueOr({});
         if (event == "log" && entry.isObject() && matches(entry)) {
             write(entry);
         }

@@ -1,9 +1,9 @@
 #include "cli/server_address.h"
 
+#include "base/text.h"
 #include "cli/failure.h"
 
 #include <algorithm>
-#include <cctype>
 
 namespace velt::cli {
 
@@ -37,11 +37,7 @@ std::string readToken(const AddressOptions& options, Console& console) {
     if (options.tokenFile.empty()) {
         return console.environment("VELT_TOKEN").value_or("");
     }
-    std::string token = readInput(console, options.tokenFile);
-    while (!token.empty() && std::isspace(static_cast<unsigned char>(token.back())) != 0) {
-        token.pop_back();
-    }
-    return token;
+    return std::string(trimmedEnd(readInput(console, options.tokenFile), " \t\r\n"));
 }
 
 // A line end in the token would start a header of its own.

@@ -118,7 +118,7 @@ void addNotes(Failure& failure, const Json::Value& problem) {
 } // namespace
 
 Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, bool reads) {
-    Json::Value problem = parseJson(answer.body).value_or(Json::Value());
+    Json::Value problem = parseJson(answer.body).valueOr({});
     if (!problem.isObject()) {
         problem = Json::Value(Json::objectValue);
     }

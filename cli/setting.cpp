@@ -1,6 +1,7 @@
 #include "cli/setting.h"
 
 #include "base/number_text.h"
+#include "base/text.h"
 #include "cli/failure.h"
 #include "schema/setting_text.h"
 
@@ -10,12 +11,6 @@
 namespace velt::cli {
 
 namespace {
-
-std::string lowerCase(std::string word) {
-    std::transform(word.begin(), word.end(), word.begin(),
-                   [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
-    return word;
-}
 
 Json::Value parseBoolean(const std::string& word) {
     const std::string lower = lowerCase(word);

@@ -1,11 +1,12 @@
 #include "cli/settings_document.h"
 
+#include "base/number_text.h"
+#include "base/text.h"
 #include "cli/current_settings.h"
 #include "cli/printable.h"
 #include "cli/setting_change.h"
 
 #include <algorithm>
-#include <charconv>
 
 namespace velt::cli {
 
@@ -21,15 +22,10 @@ std::vector<SettingGroup> groupsInOrder() {
 
 // Whether the port lies in a passive range such as "55536:55899".
 bool inRange(const std::string& range, int port) {
-    int first = 0;
-    int last = 0;
-    const char* const end = range.data() + range.size();
-    const auto colon = std::from_chars(range.data(), end, first);
-    if (colon.ec != std::errc() || colon.ptr == end || *colon.ptr != ':' ||
-        std::from_chars(colon.ptr + 1, end, last).ec != std::errc()) {
-        return false;
-    }
-    return first <= port && port <= last;
+    std::string_view rest = range;
+    const auto first = parseNumber(cut(rest, ':'));
+    const auto last = parseNumber(rest);
+    return first && last && *first <= port && port <= *last;
 }
 
 // A port that the document moves from SFTP to FTP is free only after SFTP has moved.

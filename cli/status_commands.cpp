@@ -76,7 +76,7 @@ std::string describeEvent(const std::string& event, const Json::Value& data) {
 }
 
 void writeEvent(Context& context, const std::string& event, const std::string& text) {
-    const Json::Value data = parseJson(text).value_or(Json::Value(text));
+    const Json::Value data = parseJson(text).valueOr(text);
     if (context.json) {
         Json::Value line;
         line["event"] = event;

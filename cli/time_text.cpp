@@ -1,6 +1,7 @@
 #include "cli/time_text.h"
 
-#include <charconv>
+#include "base/number_text.h"
+
 #include <iomanip>
 #include <sstream>
 
@@ -55,17 +56,12 @@ std::optional<std::string> parseSince(const std::string& text, std::time_t now) 
     if (startsWithDate(text)) {
         return text;
     }
-    if (text.size() < 2) {
+    const auto unit = secondsOfUnit(text.empty() ? ' ' : text.back());
+    const auto count = parseNumber(std::string_view(text).substr(0, text.size() - 1));
+    if (!unit || !count || *count < 0 || *count > INT32_MAX) {
         return std::nullopt;
     }
-    const std::optional<std::int64_t> unit = secondsOfUnit(text.back());
-    std::int32_t count = 0;
-    const char* const end = text.data() + text.size() - 1;
-    const auto [rest, error] = std::from_chars(text.data(), end, count);
-    if (!unit || error != std::errc() || rest != end || count < 0) {
-        return std::nullopt;
-    }
-    return utcText(now - static_cast<std::time_t>(count * *unit));
+    return utcText(now - *count * *unit);
 }
 
 std::string durationText(std::int64_t seconds) {

@@ -1,5 +1,6 @@
 #include "host/api/access_control.h"
 
+#include "base/text.h"
 #include "host/api/problem.h"
 #include "host/base/account_names.h"
 #include "host/base/random_text.h"
@@ -7,18 +8,11 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <cctype>
 #include <utility>
 
 namespace velt::host {
 
 namespace {
-
-std::string lowered(std::string text) {
-    std::transform(text.begin(), text.end(), text.begin(),
-                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-    return text;
-}
 
 /// Splits "[::1]:8080" into "::1" and "8080".
 std::pair<std::string, std::string> splitHost(const std::string& host) {
@@ -38,8 +32,8 @@ bool isForeignPage(const HttpRequest& head, const Peer& peer) {
     if (!head.fetchSite.empty() && head.fetchSite != "same-origin" && head.fetchSite != "none") {
         return true;
     }
-    const std::string own = (peer.isTls ? "https://" : "http://") + lowered(head.host);
-    return !head.origin.empty() && lowered(head.origin) != own;
+    const std::string own = (peer.isTls ? "https://" : "http://") + lowerCase(head.host);
+    return !head.origin.empty() && lowerCase(head.origin) != own;
 }
 
 } // namespace
@@ -85,7 +79,7 @@ std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, cons
         return std::nullopt;
     }
     constexpr std::size_t schemeLength = 7;
-    const bool bearer = lowered(head.authorization.substr(0, schemeLength)) == "bearer ";
+    const bool bearer = lowerCase(head.authorization.substr(0, schemeLength)) == "bearer ";
     const auto token = bearer ? tokens_.find(head.authorization.substr(schemeLength)) : std::nullopt;
     if (!token) {
         return refuse(401, "The token is not valid.", peer, true);
@@ -104,11 +98,11 @@ bool AccessControl::isAdmin(const Peer& peer) const {
 }
 
 bool AccessControl::knowsHost(const std::string& host, const Peer& peer) const {
-    const auto [name, port] = splitHost(lowered(host));
+    const auto [name, port] = splitHost(lowerCase(host));
     if (!port.empty() && port != std::to_string(peer.localPort)) {
         return false;
     }
-    const auto isName = [&name = name](const std::string& each) { return lowered(each) == name; };
+    const auto isName = [&name = name](const std::string& each) { return lowerCase(each) == name; };
     return name == "localhost" || name == "127.0.0.1" || name == "::1" || name == peer.localAddress ||
            std::any_of(settings_.hostNames.begin(), settings_.hostNames.end(), isName);
 }

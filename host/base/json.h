@@ -1,4 +1,4 @@
-// JSON as text. Thread-safe: each thread has its own reader and writer.
+// JSON as clients send it and as it is answered. Thread-safe.
 #ifndef VELT_HOST_BASE_JSON_H
 #define VELT_HOST_BASE_JSON_H
 

@@ -1,17 +1,14 @@
 #include "standalone/shares/share_file.h"
 
+#include "base/json_text.h"
 #include "base/plain_text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
-#include <json/json.h>
-
 #include <algorithm>
 #include <array>
-#include <exception>
 #include <initializer_list>
-#include <memory>
 
 namespace velt {
 
@@ -24,34 +21,6 @@ constexpr std::array accessWords{"none", "read", "write"};
 
 Error damaged(const std::string& why) {
     return {ErrorNumber::damaged, statePath(paths::shares).string() + ": " + why + "."};
-}
-
-/// "* Line 2, Column 3\n  Missing '}'.\n* Line ...": the JSON library's complaints, of which the first one
-/// says all.
-std::string firstOf(const std::string& complaints) {
-    std::string text = complaints.substr(0, complaints.find("\n* "));
-    text.erase(0, text.find_first_not_of("* "));
-    if (const auto newLine = text.find("\n  "); newLine != std::string::npos) {
-        text.replace(newLine, 3, ": ");
-    }
-    text.erase(text.find_last_not_of(".\n") + 1);
-    return text;
-}
-
-Result<Json::Value> parseJson(std::string_view text) {
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
-    Json::Value root;
-    std::string errors;
-    try {
-        if (reader->parse(text.data(), text.data() + text.size(), &root, &errors)) {
-            return root;
-        }
-    } catch (const Json::Exception& tooDeep) {
-        errors = tooDeep.what();
-    }
-    return damaged("invalid JSON: " + plainText(firstOf(errors), 300));
 }
 
 /// Reads the members of a JSON object and keeps the first mistake; what is read after it means nothing.
@@ -164,7 +133,7 @@ Json::Value grantsValue(const std::map<std::string, Access>& grants) {
 Result<std::vector<ShareEntry>> parseShares(std::string_view text) {
     const Result<Json::Value> root = parseJson(text);
     if (!root) {
-        return root.error();
+        return damaged("invalid JSON: " + plainText(root.error().message, 300));
     }
     if (const Result<> good = checkRoot(*root); !good) {
         return good.error();
@@ -198,10 +167,7 @@ std::string renderShares(const std::vector<ShareEntry>& shares) {
     Json::Value root(Json::objectValue);
     root["version"] = formVersion;
     root["shares"] = std::move(list);
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "  ";
-    builder["emitUTF8"] = true;
-    return Json::writeString(builder, root) + "\n";
+    return jsonText(root, "  ") + "\n";
 }
 
 } // namespace velt

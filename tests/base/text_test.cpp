@@ -15,6 +15,11 @@ TEST(Text, IsTrimmedAtItsEnds) {
     EXPECT_EQ(trimmedEnd("", "."), "");
 }
 
+TEST(Text, HasASmallForm) {
+    EXPECT_EQ(lowerCase("AbZ @[`{ 09\xC3\x84"), "abz @[`{ 09\xC3\x84");
+    EXPECT_EQ(lowerCase(""), "");
+}
+
 TEST(Text, IsCutAtASeparator) {
     std::string_view rest = "a,,b";
     EXPECT_EQ(cut(rest, ','), "a");

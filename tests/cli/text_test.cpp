@@ -1,3 +1,4 @@
+#include "base/json_text.h"
 #include "cli/http_client.h"
 #include "cli/json_io.h"
 #include "cli/printable.h"
@@ -9,6 +10,7 @@
 #include <sstream>
 
 using namespace velt::cli;
+using velt::parseJson;
 
 TEST(TextTest, ControlCharactersCannotReachATerminal) {
     EXPECT_EQ(printable("plain \xC3\xBC"), "plain \xC3\xBC");
@@ -74,12 +76,13 @@ TEST(TextTest, JsonIsReadStrictly) {
     EXPECT_TRUE(parseJson("5"));
     for (const char* text :
          {"", "{} x", "{'a': 1}", "{\"a\": 1, \"a\": 2}", "{\"a\": 1,}", "// c\n{}", "NaN"}) {
-        std::string reason;
-        EXPECT_FALSE(parseJson(text, &reason)) << text;
+        const auto parsed = parseJson(text);
+        ASSERT_FALSE(parsed) << text;
+        const std::string& reason = parsed.error().message;
         EXPECT_EQ(reason.rfind("line ", 0), 0U) << reason;
         EXPECT_EQ(reason.find('\n'), std::string::npos) << reason;
     }
-    std::string reason;
-    EXPECT_FALSE(parseJson("{\n  \"a\" 1}", &reason));
-    EXPECT_EQ(reason, "line 2, column 7: Missing ':' after object member name");
+    const auto parsed = parseJson("{\n  \"a\" 1}");
+    ASSERT_FALSE(parsed);
+    EXPECT_EQ(parsed.error().message, "line 2, column 7: Missing ':' after object member name");
 }

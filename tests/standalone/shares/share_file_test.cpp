@@ -85,8 +85,8 @@ TEST(ShareFile, KeepsOddButAllowedTextAsItIs) {
 }
 
 TEST(ShareFile, NamesTheFlawOfADamagedText) {
-    EXPECT_EQ(flawIn("").substr(0, 32), "invalid JSON: Line 1, Column 1: ");
-    EXPECT_EQ(flawIn("{\"version\":1,\n\"shares\":[}").substr(0, 29), "invalid JSON: Line 2, Column ");
+    EXPECT_EQ(flawIn("").substr(0, 32), "invalid JSON: line 1, column 1: ");
+    EXPECT_EQ(flawIn("{\"version\":1,\n\"shares\":[}").substr(0, 29), "invalid JSON: line 2, column ");
     EXPECT_EQ(flawIn("[]"), "expected an object");
     EXPECT_EQ(flawIn(R"({"shares":[]})"), "\"version\": expected 1");
     EXPECT_EQ(flawIn(R"({"version":2,"shares":[]})"), "\"version\": expected 1");
