@@ -1,3 +1,4 @@
+#include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -8,6 +9,7 @@
 #include <CLI/CLI.hpp>
 
 #include <algorithm>
+#include <functional>
 #include <memory>
 
 namespace velt::cli {
@@ -20,9 +22,7 @@ struct RuleOptions {
 };
 
 void writeRules(Context& context, const ChrootRules& rules) {
-    Json::Value result;
-    result["rules"] = rulesToJson(rules);
-    if (context.wroteJson(result)) {
+    if (context.wroteJson(jsonObject({{"rules", rulesToJson(rules)}}))) {
         return;
     }
     Table table({"TYPE", "NAME", "FOLDER"});
@@ -112,11 +112,10 @@ struct UserOptions {
 };
 
 void listUsers(Context& context, const UserOptions& options) {
-    Json::Value parameters;
-    parameters["chroot"] = !options.others;
-    parameters["offset"] = options.offset;
-    parameters["limit"] = options.limit;
-    parameters["type"] = options.source;
+    Json::Value parameters = jsonObject({{"chroot", !options.others},
+                                         {"offset", options.offset},
+                                         {"limit", options.limit},
+                                         {"type", options.source}});
     if (!options.domain.empty()) {
         parameters["domain_name"] = options.domain;
     }
@@ -136,10 +135,7 @@ void listUsers(Context& context, const UserOptions& options) {
 }
 
 void changeUsers(Context& context, const UserOptions& options, const char* method, const char* sentence) {
-    Json::Value parameters;
-    for (const std::string& name : options.names) {
-        parameters["id"].append(name);
-    }
+    const Json::Value parameters = jsonObject({{"id", jsonArray(options.names, std::identity())}});
     const Json::Value answer = context.api.call({chrootApi, 1, method}, parameters);
     if (context.wroteJson(answer.isNull() ? parameters : answer)) {
         return;

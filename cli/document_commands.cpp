@@ -1,3 +1,4 @@
+#include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -55,17 +56,13 @@ void writeStep(Context& context, const ImportStep& step) {
 
 void writeResult(Context& context, const ImportPlan& plan, std::size_t applied, bool dryRun) {
     if (context.json) {
-        Json::Value result;
-        result["dry_run"] = dryRun;
-        result["sections"] = Json::Value(Json::arrayValue);
-        for (std::size_t i = 0; i < plan.steps.size(); ++i) {
-            Json::Value section;
-            section["section"] = plan.steps[i].section;
-            section["changes"] = plan.steps[i].changesJson;
-            section["applied"] = i < applied;
-            result["sections"].append(section);
+        Json::Value sections(Json::arrayValue);
+        for (const ImportStep& step : plan.steps) {
+            sections.append(jsonObject({{"section", step.section},
+                                        {"changes", step.changesJson},
+                                        {"applied", sections.size() < applied}}));
         }
-        writeJson(context.console.out, result);
+        writeJson(context.console.out, jsonObject({{"dry_run", dryRun}, {"sections", sections}}));
     } else if (plan.steps.empty()) {
         context.console.out << "Nothing to change.\n";
     } else if (dryRun) {

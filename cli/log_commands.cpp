@@ -1,3 +1,4 @@
+#include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -56,10 +57,7 @@ std::string timeOf(const Json::Value& entry) {
 }
 
 void writeLog(Context& context, const Json::Value& entries, const Json::Value& next) {
-    Json::Value result;
-    result["entries"] = entries;
-    result["next"] = next;
-    if (context.wroteJson(result)) {
+    if (context.wroteJson(jsonObject({{"entries", entries}, {"next", next}}))) {
         return;
     }
     Table table({"ID", "TIME", "EVENT", "ACTOR", "ADDRESS", "TEXT"});

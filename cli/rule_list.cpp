@@ -1,5 +1,6 @@
 #include "cli/rule_list.h"
 
+#include "base/json_value.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
 #include "cli/server_refusal.h"
@@ -26,9 +27,7 @@ std::optional<std::string> faultIn(const Json::Value& object) {
 }
 
 void replaceRules(ApiClient& api, const ChrootRules& rules) {
-    Json::Value parameters;
-    parameters["rules"] = rulesToJson(rules);
-    api.call(saveMethod, parameters);
+    api.call(saveMethod, jsonObject({{"rules", rulesToJson(rules)}}));
 }
 
 } // namespace
@@ -52,15 +51,9 @@ std::optional<std::string> faultOf(const ChrootRule& rule) {
 }
 
 Json::Value rulesToJson(const ChrootRules& rules) {
-    Json::Value array(Json::arrayValue);
-    for (const ChrootRule& rule : rules) {
-        Json::Value object;
-        object["type"] = rule.type;
-        object["name"] = rule.name;
-        object["path"] = rule.path;
-        array.append(object);
-    }
-    return array;
+    return jsonArray(rules, [](const ChrootRule& rule) {
+        return jsonObject({{"type", rule.type}, {"name", rule.name}, {"path", rule.path}});
+    });
 }
 
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults) {

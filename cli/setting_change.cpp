@@ -1,16 +1,13 @@
 #include "cli/setting_change.h"
 
+#include "base/json_value.h"
 #include "cli/json_io.h"
 #include "cli/printable.h"
 
 namespace velt::cli {
 
 Json::Value changeToJson(const SettingChange& change) {
-    Json::Value result;
-    result["key"] = change.key;
-    result["from"] = change.from;
-    result["to"] = change.to;
-    return result;
+    return jsonObject({{"key", change.key}, {"from", change.from}, {"to", change.to}});
 }
 
 std::string changeToText(const SettingChange& change) {

@@ -1,3 +1,4 @@
+#include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/current_settings.h"
 #include "cli/failure.h"
@@ -39,13 +40,7 @@ void warnOfKeptValues(Context& context, const Json::Value& wanted, const Json::V
 }
 
 void writeChanges(Context& context, const std::vector<SettingChange>& changes, const Json::Value& after) {
-    Json::Value result;
-    result["changed"] = Json::Value(Json::arrayValue);
-    for (const SettingChange& change : changes) {
-        result["changed"].append(changeToJson(change));
-    }
-    result["settings"] = after;
-    if (context.wroteJson(result)) {
+    if (context.wroteJson(jsonObject({{"changed", jsonArray(changes, changeToJson)}, {"settings", after}}))) {
         return;
     }
     for (const SettingChange& change : changes) {

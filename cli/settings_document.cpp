@@ -1,5 +1,6 @@
 #include "cli/settings_document.h"
 
+#include "base/json_value.h"
 #include "base/number_text.h"
 #include "base/text.h"
 #include "cli/current_settings.h"
@@ -117,10 +118,7 @@ std::vector<Json::Value> requestsFor(const Json::Value& wanted, const Json::Valu
     Json::Value first = wanted;
     first.removeMember("custom_port");
     first["custom_port_range"] = false;
-    Json::Value second(Json::objectValue);
-    second["custom_port_range"] = true;
-    second["custom_port"] = wanted["custom_port"];
-    return {first, second};
+    return {first, jsonObject({{"custom_port_range", true}, {"custom_port", wanted["custom_port"]}})};
 }
 
 void change(ApiClient& api, const SettingGroup& group, const Json::Value& wanted) {
@@ -187,10 +185,9 @@ void planRules(ApiClient& api, const Json::Value& array, ImportPlan& plan) {
 } // namespace
 
 Json::Value exportSettings(ApiClient& api) {
-    Json::Value document;
-    document["format"] = formatName;
-    document["format_version"] = formatVersion;
-    document[rulesSection] = rulesToJson(loadRules(api));
+    Json::Value document = jsonObject({{"format", formatName},
+                                       {"format_version", formatVersion},
+                                       {rulesSection, rulesToJson(loadRules(api))}});
     for (const SettingGroup& group : groupsInOrder()) {
         document[group.command] = knownSettings(group, readCurrentSettings(api, group).stored);
     }

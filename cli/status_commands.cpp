@@ -1,3 +1,4 @@
+#include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -78,10 +79,7 @@ std::string describeEvent(const std::string& event, const Json::Value& data) {
 void writeEvent(Context& context, const std::string& event, const std::string& text) {
     const Json::Value data = parseJson(text).valueOr(text);
     if (context.json) {
-        Json::Value line;
-        line["event"] = event;
-        line["data"] = data;
-        context.console.out << compactJson(line) << '\n';
+        context.console.out << compactJson(jsonObject({{"event", event}, {"data", data}})) << '\n';
     } else {
         context.console.out << utcText(std::time(nullptr)) << "  " << printable(event) << "  "
                             << printable(describeEvent(event, data)) << '\n';

@@ -1,3 +1,4 @@
+#include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -33,10 +34,8 @@ void listTokens(Context& context) {
 }
 
 void createToken(Context& context, const TokenOptions& options) {
-    Json::Value body;
-    body["name"] = options.name;
-    body["role"] = options.role;
-    const Json::Value token = context.api.post("/api/tokens", body);
+    const Json::Value token =
+        context.api.post("/api/tokens", jsonObject({{"name", options.name}, {"role", options.role}}));
     if (context.wroteJson(token)) {
         return;
     }
@@ -49,12 +48,9 @@ void createToken(Context& context, const TokenOptions& options) {
 
 void deleteToken(Context& context, const TokenOptions& options) {
     context.api.remove("/api/tokens/" + percentEncode(options.id));
-    Json::Value result;
-    result["deleted"] = options.id;
-    if (context.wroteJson(result)) {
-        return;
+    if (!context.wroteJson(jsonObject({{"deleted", options.id}}))) {
+        context.console.out << "Token " << printable(options.id) << " is no longer valid.\n";
     }
-    context.console.out << "Token " << printable(options.id) << " is no longer valid.\n";
 }
 
 } // namespace

@@ -1,5 +1,6 @@
 // veltd: loads the modules over the platform and serves them.
 
+#include "base/json_value.h"
 #include "host/api/app.h"
 #include "host/base/host_log.h"
 #include "host/base/instance_lock.h"
@@ -54,8 +55,7 @@ Json::Value listenEverywhere(const Config& config, HttpServer& server, HostLog& 
     for (const std::string& address : config.listen) {
         listeners.push_back(Listener::tcp(address, config.allowRemote));
     }
-    Json::Value ready(Json::objectValue);
-    ready["listen"] = Json::Value(Json::arrayValue);
+    Json::Value ready = velt::jsonObject({{"listen", Json::arrayValue}});
     for (Listener& listener : listeners) {
         log.write("listening on " + listener.name());
         if (listener.isUnixSocket()) {

@@ -1,5 +1,6 @@
 #include "host/api/events.h"
 
+#include "base/json_value.h"
 #include "host/api/log_page.h"
 
 namespace velt::host {
@@ -13,10 +14,8 @@ std::string valueOf(const SystemEvent& event, const char* key) {
 
 void publish(EventHub& hub, const SystemEvent& event) {
     if (event.name == "velt.service.action") {
-        Json::Value data(Json::objectValue);
-        data["service"] = valueOf(event, "SERVICE_NAME");
-        data["action"] = valueOf(event, "SERVICE_ACTION");
-        hub.publish("service", data);
+        hub.publish("service", jsonObject({{"service", valueOf(event, "SERVICE_NAME")},
+                                           {"action", valueOf(event, "SERVICE_ACTION")}}));
     }
 }
 

@@ -1,5 +1,6 @@
 #include "host/api/log_page.h"
 
+#include "base/json_value.h"
 #include "host/api/problem.h"
 #include "host/base/clock.h"
 #include "host/base/percent_encoding.h"
@@ -8,6 +9,7 @@
 #include <array>
 #include <charconv>
 #include <cstdio>
+#include <functional>
 #include <sstream>
 
 namespace velt::host {
@@ -132,13 +134,8 @@ HttpResponse answerPage(const LogFilter& filter, const Call& call) {
     if (!next) {
         return problem(500, next.error().message, call.id);
     }
-    Json::Value value(Json::objectValue);
-    value["next"] = *next;
-    value["entries"] = Json::Value(Json::arrayValue);
-    for (const LogEntry& entry : *page) {
-        value["entries"].append(toObject(entry));
-    }
-    return jsonResponse(200, value);
+    const auto describe = [](const LogEntry& entry) { return toObject(entry); };
+    return jsonResponse(200, jsonObject({{"next", *next}, {"entries", jsonArray(*page, describe)}}));
 }
 
 } // namespace
@@ -146,20 +143,15 @@ HttpResponse answerPage(const LogFilter& filter, const Call& call) {
 Json::Value toObject(const LogEntry& entry) {
     std::array<char, 16> event{};
     std::snprintf(event.data(), event.size(), "0x%08X", entry.event);
-    Json::Value object(Json::objectValue);
-    object["id"] = Json::Int64{entry.id};
-    object["time"] = timestamp(entry.time);
-    object["category"] = entry.category;
-    object["level"] = entry.level;
-    object["event"] = event.data();
-    object["text"] = entry.sentence;
-    object["args"] = Json::Value(Json::arrayValue);
-    for (const std::string& text : entry.texts) {
-        object["args"].append(text);
-    }
-    object["actor"] = entry.actor;
-    object["address"] = entry.address;
-    return object;
+    return jsonObject({{"id", Json::Int64{entry.id}},
+                       {"time", timestamp(entry.time)},
+                       {"category", entry.category},
+                       {"level", entry.level},
+                       {"event", event.data()},
+                       {"text", entry.sentence},
+                       {"args", jsonArray(entry.texts, std::identity())},
+                       {"actor", entry.actor},
+                       {"address", entry.address}});
 }
 
 Route logRoute() {

@@ -1,5 +1,6 @@
 #include "host/api/problem.h"
 
+#include "base/json_value.h"
 #include "host/base/json.h"
 #include "host/http/response_text.h"
 
@@ -8,9 +9,7 @@
 namespace velt::host {
 
 HttpResponse problem(int status, const std::string& detail, const std::string& requestId) {
-    Json::Value members(Json::objectValue);
-    members["detail"] = detail;
-    return problemWith(status, std::move(members), requestId);
+    return problemWith(status, jsonObject({{"detail", detail}}), requestId);
 }
 
 HttpResponse problemWith(int status, Json::Value members, const std::string& requestId) {
@@ -30,17 +29,14 @@ HttpResponse notAnObject(const Error& reason, const std::string& extent, const s
 
 HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
                           const std::string& requestId) {
-    Json::Value members(Json::objectValue);
-    members["detail"] = error.field + ": expected " + error.expected + "." + extent;
+    Json::Value members =
+        jsonObject({{"detail", error.field + ": expected " + error.expected + "." + extent}});
     members["errors"].append(toObject(error));
     return problemWith(status, std::move(members), requestId);
 }
 
 Json::Value toObject(const FieldError& error) {
-    Json::Value object(Json::objectValue);
-    object["field"] = error.field;
-    object["expected"] = error.expected;
-    return object;
+    return jsonObject({{"field", error.field}, {"expected", error.expected}});
 }
 
 HttpResponse jsonResponse(int status, const Json::Value& value) {

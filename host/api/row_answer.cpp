@@ -1,5 +1,6 @@
 #include "host/api/row_answer.h"
 
+#include "base/json_value.h"
 #include "host/api/problem.h"
 #include "host/api/service_status.h"
 #include "host/module/module_log.h"
@@ -83,10 +84,9 @@ std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& mean
 HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<FieldError>& errors,
                      const std::string& requestId) {
     const Meaning& meaning = meaningOf(outcome.code);
-    Json::Value members(Json::objectValue);
-    members["title"] = meaning.title;
-    members["code"] = outcome.code;
-    members["detail"] = detailOf(row, outcome, meaning, errors);
+    Json::Value members = jsonObject({{"title", meaning.title},
+                                      {"code", outcome.code},
+                                      {"detail", detailOf(row, outcome, meaning, errors)}});
     if (!row.reads()) {
         members["changed"] = outcome.platform.changed;
     }
@@ -101,14 +101,13 @@ HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<F
 
 /// The module accepted the change, but a service that is switched on does not run.
 HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
-    Json::Value members(Json::objectValue);
-    members["title"] = "A service that is switched on does not run";
-    members["detail"] = "The change is stored. " + sentenceOf(outcome.down);
-    members["changed"] = outcome.platform.changed;
-    for (const ServiceDown& each : outcome.down) {
-        members["down"].append(toObject(each));
-    }
-    return problemWith(500, std::move(members), requestId);
+    const auto describe = [](const ServiceDown& down) { return toObject(down); };
+    return problemWith(500,
+                       jsonObject({{"title", "A service that is switched on does not run"},
+                                   {"detail", "The change is stored. " + sentenceOf(outcome.down)},
+                                   {"changed", outcome.platform.changed},
+                                   {"down", jsonArray(outcome.down, describe)}}),
+                       requestId);
 }
 
 } // namespace

@@ -1,5 +1,6 @@
 #include "host/api/rows.h"
 
+#include "base/json_value.h"
 #include "host/api/problem.h"
 #include "host/api/row_answer.h"
 #include "host/api/service_status.h"
@@ -44,17 +45,11 @@ std::vector<Route> Rows::routes() {
 }
 
 HttpResponse Rows::list() const {
-    Json::Value value(Json::objectValue);
-    value["rows"] = Json::Value(Json::arrayValue);
-    for (const Row* row : table_.rows()) {
-        Json::Value object(Json::objectValue);
-        object["api"] = row->api;
-        object["version"] = row->version;
-        object["method"] = row->method;
-        object["read"] = row->reads();
-        value["rows"].append(object);
-    }
-    return jsonResponse(200, value);
+    const auto describe = [](const Row* row) {
+        return jsonObject(
+            {{"api", row->api}, {"version", row->version}, {"method", row->method}, {"read", row->reads()}});
+    };
+    return jsonResponse(200, jsonObject({{"rows", jsonArray(table_.rows(), describe)}}));
 }
 
 HttpResponse Rows::call(const Row& row, const Call& call) {
@@ -107,13 +102,11 @@ void Rows::countStarts(const PlatformReport& platform) {
 }
 
 void Rows::publishChange(const Row& row, const Call& call) {
-    Json::Value data(Json::objectValue);
-    data["api"] = row.api;
-    data["version"] = row.version;
-    data["method"] = row.method;
-    data["actor"] = call.principal.actor;
-    data["request_id"] = call.id;
-    events_.publish("request", data);
+    events_.publish("request", jsonObject({{"api", row.api},
+                                           {"version", row.version},
+                                           {"method", row.method},
+                                           {"actor", call.principal.actor},
+                                           {"request_id", call.id}}));
 }
 
 void Rows::logOutcome(const Row& row, const Outcome& outcome, int status, const Call& call) {

@@ -1,5 +1,6 @@
 #include "host/api/service_status.h"
 
+#include "base/json_value.h"
 #include "host/module/module_call.h"
 
 #include <algorithm>
@@ -108,11 +109,10 @@ std::string sentenceOf(const std::vector<ServiceDown>& down) {
 }
 
 Json::Value toObject(const Service& service) {
-    Json::Value object(Json::objectValue);
-    object["name"] = service.name;
-    object["enabled"] = service.enabled;
-    object["port"] = service.port;
-    object["running"] = service.running;
+    Json::Value object = jsonObject({{"name", service.name},
+                                     {"enabled", service.enabled},
+                                     {"port", service.port},
+                                     {"running", service.running}});
     if (service.wanted) {
         object["wanted"] = *service.wanted;
     }
@@ -123,11 +123,9 @@ Json::Value toObject(const Service& service) {
 }
 
 Json::Value toObject(const ServiceDown& down) {
-    Json::Value object(Json::objectValue);
-    object["service"] = down.service;
-    object["reason"] = down.reason;
-    object["serves_former_settings"] = down.servesFormerSettings;
-    return object;
+    return jsonObject({{"service", down.service},
+                       {"reason", down.reason},
+                       {"serves_former_settings", down.servesFormerSettings}});
 }
 
 } // namespace velt::host

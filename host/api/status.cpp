@@ -1,5 +1,6 @@
 #include "host/api/status.h"
 
+#include "base/json_value.h"
 #include "host/api/problem.h"
 #include "host/api/service_status.h"
 
@@ -12,15 +13,12 @@ namespace {
 using Clock = std::chrono::steady_clock;
 
 HttpResponse status(const ModuleTable& table, Clock::time_point start, const Call& call) {
-    Json::Value value(Json::objectValue);
-    value["version"] = VELT_VERSION;
     const auto uptime = std::chrono::duration_cast<std::chrono::seconds>(Clock::now() - start);
-    value["uptime_seconds"] = Json::Int64{uptime.count()};
-    value["services"] = Json::Value(Json::arrayValue);
-    for (const Service& each : listServices(table, call.principal)) {
-        value["services"].append(toObject(each));
-    }
-    return jsonResponse(200, value);
+    const auto describe = [](const Service& service) { return toObject(service); };
+    return jsonResponse(200,
+                        jsonObject({{"version", VELT_VERSION},
+                                    {"uptime_seconds", Json::Int64{uptime.count()}},
+                                    {"services", jsonArray(listServices(table, call.principal), describe)}}));
 }
 
 HttpResponse health() {

@@ -1,6 +1,7 @@
 #include "host/api/token_store.h"
 
 #include "base/file.h"
+#include "base/json_value.h"
 #include "base/sha256.h"
 #include "host/base/clock.h"
 #include "host/base/json.h"
@@ -42,12 +43,8 @@ std::optional<Token> fromObject(const Json::Value& object) {
 } // namespace
 
 Json::Value toObject(const Token& token) {
-    Json::Value object(Json::objectValue);
-    object["id"] = token.id;
-    object["name"] = token.name;
-    object["role"] = roleName(token.role);
-    object["created"] = token.created;
-    return object;
+    return jsonObject(
+        {{"id", token.id}, {"name", token.name}, {"role", roleName(token.role)}, {"created", token.created}});
 }
 
 const char* roleName(Role role) {
@@ -90,11 +87,7 @@ void TokenStore::read() {
 }
 
 void TokenStore::store(const std::vector<Token>& tokens) const {
-    Json::Value root(Json::objectValue);
-    root["tokens"] = Json::Value(Json::arrayValue);
-    for (const Token& token : tokens) {
-        root["tokens"].append(toStored(token));
-    }
+    const Json::Value root = jsonObject({{"tokens", jsonArray(tokens, toStored)}});
     if (const auto stored = replaceFile(file_, toJson(root) + "\n", 0600); !stored) {
         throw TokenError(stored.error().message);
     }

@@ -1,5 +1,6 @@
 #include "host/api/tokens.h"
 
+#include "base/json_value.h"
 #include "host/api/problem.h"
 #include "host/base/json.h"
 
@@ -21,12 +22,8 @@ bool isName(const Json::Value& value) {
 }
 
 HttpResponse list(const TokenStore& store) {
-    Json::Value value(Json::objectValue);
-    value["tokens"] = Json::Value(Json::arrayValue);
-    for (const Token& token : store.tokens()) {
-        value["tokens"].append(toObject(token));
-    }
-    return jsonResponse(200, value);
+    const auto describe = [](const Token& token) { return toObject(token); };
+    return jsonResponse(200, jsonObject({{"tokens", jsonArray(store.tokens(), describe)}}));
 }
 
 HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {

@@ -1,6 +1,7 @@
 #include "host/trial/first_state.h"
 
 #include "base/file.h"
+#include "base/json_value.h"
 #include "ftp/ftp_library.h"
 #include "host/base/account_names.h"
 #include "host/base/json.h"
@@ -56,15 +57,13 @@ void makeDemoShare(const std::filesystem::path& place) {
     } else {
         makeDemoUser(place);
     }
-    Json::Value share(Json::objectValue);
-    share["name"] = demo;
-    share["comment"] = "A share to try";
-    share["path"] = (place / demo).string();
-    share["ftp"] = true;
-    share["users"][root ? "ftp" : userName(::geteuid())] = "write";
-    Json::Value shares(Json::objectValue);
-    shares["version"] = 1;
-    shares["shares"].append(share);
+    const std::string user = root ? "ftp" : userName(::geteuid());
+    Json::Value shares = jsonObject({{"version", 1}});
+    shares["shares"].append(jsonObject({{"name", demo},
+                                        {"comment", "A share to try"},
+                                        {"path", (place / demo).string()},
+                                        {"ftp", true},
+                                        {"users", jsonObject({{user.c_str(), "write"}})}}));
     check(replaceFile("etc/velt/shares.json", toJson(shares) + "\n", 0644));
 }
 

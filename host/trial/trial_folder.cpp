@@ -1,6 +1,7 @@
 #include "host/trial/trial_folder.h"
 
 #include "base/file.h"
+#include "base/json_value.h"
 #include "host/base/account_names.h"
 #include "host/base/json.h"
 #include "host/trial/trial_error.h"
@@ -72,10 +73,8 @@ TrialRecord TrialFolder::record() const {
 }
 
 void TrialFolder::store(const TrialRecord& record) const {
-    Json::Value object(Json::objectValue);
-    object["place"] = record.place.string();
-    object["http_port"] = record.httpPort;
-    object["build"] = record.build;
+    const Json::Value object = jsonObject(
+        {{"place", record.place.string()}, {"http_port", record.httpPort}, {"build", record.build}});
     check(replaceFile(recordFile, toJson(object) + "\n", 0644));
 }
 
