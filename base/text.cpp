@@ -18,6 +18,17 @@ std::string lowerCase(std::string_view text) {
     return lower;
 }
 
+std::string hexadecimal(std::string_view bytes) {
+    constexpr std::string_view digits = "0123456789abcdef";
+    std::string text;
+    for (const char c : bytes) {
+        const auto byte = static_cast<unsigned char>(c);
+        text += digits[byte >> 4U];
+        text += digits[byte & 0xFU];
+    }
+    return text;
+}
+
 std::string_view cut(std::string_view& rest, char separator) {
     const std::size_t end = rest.find(separator);
     const std::string_view head = rest.substr(0, end);

@@ -18,6 +18,9 @@ std::string_view trimmedEnd(std::string_view text, std::string_view characters);
 /// The text with the letters A to Z as small ones.
 std::string lowerCase(std::string_view text);
 
+/// Two digits for each byte: "0aff".
+std::string hexadecimal(std::string_view bytes);
+
 /// Cuts the text before the first `separator` off `rest`, which becomes what follows it; "" when nothing
 /// does.
 std::string_view cut(std::string_view& rest, char separator);

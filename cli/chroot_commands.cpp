@@ -1,8 +1,8 @@
 #include "base/json_value.h"
+#include "base/printable.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
-#include "cli/printable.h"
 #include "cli/rule_list.h"
 #include "cli/text_table.h"
 
@@ -59,25 +59,33 @@ void replaceRules(Context& context, const RuleOptions& options) {
     writeRules(context, rules);
 }
 
-void addRule(Context& context, const RuleOptions& options) {
-    if (const auto fault = faultOf(options.rule)) {
-        throw Failure(ExitCode::usage, "Invalid rule: " + *fault + ".",
-                      "Write it as in 'veltctl chroot rules add user NAME /SHARE'.");
-    }
+void changeRules(Context& context, const std::function<void(ChrootRules&)>& change) {
     ChrootRules rules;
     context.api.changeWhatWasRead([&] {
         const ChrootRules before = loadRules(context.api);
         rules = before;
-        if (std::find(rules.begin(), rules.end(), options.rule) == rules.end()) {
-            rules.push_back(options.rule);
+        change(rules);
+        if (rules != before) {
             storeRules(context.api, rules, before);
         }
     });
     writeRules(context, rules);
 }
 
+void addRule(Context& context, const RuleOptions& options) {
+    if (const auto fault = faultOf(options.rule)) {
+        throw Failure(ExitCode::usage, "Invalid rule: " + *fault + ".",
+                      "Write it as in 'veltctl chroot rules add user NAME /SHARE'.");
+    }
+    changeRules(context, [&](ChrootRules& rules) {
+        if (std::ranges::find(rules, options.rule) == rules.end()) {
+            rules.push_back(options.rule);
+        }
+    });
+}
+
 // Failure when there is nothing to remove.
-ChrootRules rulesWithout(ChrootRules rules, const ChrootRule& wanted) {
+void removeFrom(ChrootRules& rules, const ChrootRule& wanted) {
     const std::size_t removed = std::erase_if(rules, [&](const ChrootRule& rule) {
         return rule.type == wanted.type && rule.name == wanted.name &&
                (wanted.path.empty() || rule.path == wanted.path);
@@ -88,17 +96,10 @@ ChrootRules rulesWithout(ChrootRules rules, const ChrootRule& wanted) {
                       "There is no rule for the " + wanted.type + " " + wanted.name + folder + ".",
                       "See 'veltctl chroot rules load' for the rules.");
     }
-    return rules;
 }
 
 void removeRule(Context& context, const RuleOptions& options) {
-    ChrootRules rules;
-    context.api.changeWhatWasRead([&] {
-        const ChrootRules before = loadRules(context.api);
-        rules = rulesWithout(before, options.rule);
-        storeRules(context.api, rules, before);
-    });
-    writeRules(context, rules);
+    changeRules(context, [&](ChrootRules& rules) { removeFrom(rules, options.rule); });
 }
 
 struct UserOptions {

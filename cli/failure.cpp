@@ -1,6 +1,6 @@
 #include "cli/failure.h"
 
-#include "cli/printable.h"
+#include "base/printable.h"
 
 #include <ostream>
 #include <sstream>

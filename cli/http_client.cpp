@@ -15,6 +15,13 @@ namespace {
 constexpr std::size_t largestAnswer = std::size_t{64} * 1024 * 1024;
 constexpr long connectSeconds = 10;
 
+template<auto release> struct Release {
+    template<class Object> void operator()(Object* object) const { release(object); }
+};
+
+/// Freed by the library's function.
+template<class Object, auto release> using Owned = std::unique_ptr<Object, Release<release>>;
+
 // What the callbacks of one transfer share. An exception must not pass through the C library.
 struct Transfer {
     CURL* curl = nullptr;
@@ -92,25 +99,18 @@ Failure noAnswer(const ServerAddress& server, CURL* curl, CURLcode code, const c
 } // namespace
 
 struct HttpClient::Handle {
-    CURL* curl = curl_easy_init();
-    curl_slist* headers = nullptr;
+    Owned<CURL, curl_easy_cleanup> curl{curl_easy_init()};
+    Owned<curl_slist, curl_slist_free_all> headers;
     Transfer transfer;
     char reason[CURL_ERROR_SIZE] = {};
 
-    Handle() = default;
-    ~Handle() {
-        curl_slist_free_all(headers);
-        curl_easy_cleanup(curl);
-    }
-    Handle(const Handle&) = delete;
-    Handle& operator=(const Handle&) = delete;
-
     void addHeader(const std::string& line) {
-        curl_slist* longer = curl_slist_append(headers, line.c_str());
+        curl_slist* const longer = curl_slist_append(headers.get(), line.c_str());
         if (longer == nullptr) {
             throw std::bad_alloc();
         }
-        headers = longer;
+        (void)headers.release(); // part of the longer list, or its start
+        headers.reset(longer);
     }
 };
 
@@ -124,10 +124,9 @@ HttpClient::HttpClient(ServerAddress server)
 HttpClient::~HttpClient() = default;
 
 void HttpClient::prepare(const std::string& path) {
-    CURL* curl = handle_->curl;
+    CURL* const curl = handle_->curl.get();
     curl_easy_reset(curl); // keeps the connection
-    curl_slist_free_all(handle_->headers);
-    handle_->headers = nullptr;
+    handle_->headers.reset();
     handle_->transfer = Transfer{};
     handle_->transfer.curl = curl;
     handle_->reason[0] = '\0';
@@ -154,9 +153,9 @@ void HttpClient::prepare(const std::string& path) {
 }
 
 void HttpClient::perform(bool mayBeStopped) {
-    CURL* curl = handle_->curl;
+    CURL* const curl = handle_->curl.get();
     Transfer& transfer = handle_->transfer;
-    curl_easy_setopt(curl, CURLOPT_HTTPHEADER, handle_->headers);
+    curl_easy_setopt(curl, CURLOPT_HTTPHEADER, handle_->headers.get());
     const CURLcode code = curl_easy_perform(curl);
     if (transfer.exception) {
         std::rethrow_exception(transfer.exception);
@@ -174,7 +173,7 @@ void HttpClient::perform(bool mayBeStopped) {
 HttpAnswer HttpClient::send(const std::string& method, const std::string& path,
                             const std::optional<std::string>& body, const std::string& ifMatch) {
     prepare(path);
-    CURL* curl = handle_->curl;
+    CURL* const curl = handle_->curl.get();
     curl_easy_setopt(curl, CURLOPT_TIMEOUT, static_cast<long>(server_.timeoutSeconds));
     handle_->addHeader("Accept: application/json, application/problem+json");
     if (!ifMatch.empty()) {
@@ -195,7 +194,7 @@ HttpAnswer HttpClient::send(const std::string& method, const std::string& path,
 HttpAnswer HttpClient::follow(const std::string& path, const std::function<bool(std::string_view)>& onText,
                               const std::function<bool()>& stop) {
     prepare(path);
-    CURL* curl = handle_->curl;
+    CURL* const curl = handle_->curl.get();
     handle_->addHeader("Accept: text/event-stream");
     handle_->transfer.onText = &onText;
     handle_->transfer.stop = &stop;
@@ -207,8 +206,8 @@ HttpAnswer HttpClient::follow(const std::string& path, const std::function<bool(
 }
 
 std::string percentEncode(const std::string& text) {
-    const std::unique_ptr<char, decltype(&curl_free)> encoded(
-        curl_easy_escape(nullptr, text.c_str(), static_cast<int>(text.size())), &curl_free);
+    const Owned<char, curl_free> encoded(
+        curl_easy_escape(nullptr, text.c_str(), static_cast<int>(text.size())));
     return encoded == nullptr ? throw std::bad_alloc() : std::string(encoded.get());
 }
 

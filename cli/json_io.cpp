@@ -1,7 +1,7 @@
 #include "cli/json_io.h"
 
+#include "base/printable.h"
 #include "cli/failure.h"
-#include "cli/printable.h"
 
 #include <ostream>
 

@@ -1,6 +1,5 @@
 #include "cli/program.h"
 
-#include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/server_refusal.h"
 
@@ -17,11 +16,6 @@ constexpr const char* exitCodes =
     "Exit codes: 0 done, 1 local file, 2 usage, 3 input refused, 4 conflict, 5 the server failed, "
     "6 no connection or no access.";
 
-struct GlobalOptions {
-    AddressOptions server;
-    bool json = false;
-};
-
 void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
     app.add_flag("--json", options.json, "Write JSON, for programs");
     CLI::Option* url =
@@ -37,22 +31,6 @@ void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
     app.add_option("--timeout", options.server.timeoutSeconds, "Seconds to wait for an answer (default 60)")
         ->check(CLI::Range(1, 86400))
         ->type_name("SECONDS");
-}
-
-void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
-    app.fallthrough(); // options may stand behind the command
-    app.require_subcommand(1);
-    app.set_version_flag("--version", VELT_VERSION);
-    app.footer(exitCodes);
-    addGlobalOptions(app, options);
-    addStatusCommands(app, chosen);
-    addLogCommand(app, chosen);
-    addSettingsCommands(app, chosen);
-    addShareCommands(app, chosen);
-    addChrootCommands(app, chosen);
-    addTokenCommands(app, chosen);
-    addDocumentCommands(app, chosen);
-    addCallCommand(app, chosen);
 }
 
 // The command that was meant, as far as the words name one.
@@ -92,21 +70,23 @@ void runCommand(const Command& command, const GlobalOptions& options, Console& c
     }
 }
 
-void describeBelow(const CLI::App& app, const std::string& words, std::vector<CommandDescription>& found) {
-    const auto below = app.get_subcommands([](const CLI::App*) { return true; });
-    CommandDescription description{words, {}};
-    for (const CLI::Option* option : app.get_options()) {
-        for (const std::string& name : option->get_lnames()) {
-            description.options.push_back("--" + name);
-        }
-    }
-    found.push_back(description);
-    for (const CLI::App* child : below) {
-        describeBelow(*child, words.empty() ? child->get_name() : words + " " + child->get_name(), found);
-    }
-}
-
 } // namespace
+
+void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
+    app.fallthrough(); // options may stand behind the command
+    app.require_subcommand(1);
+    app.set_version_flag("--version", VELT_VERSION);
+    app.footer(exitCodes);
+    addGlobalOptions(app, options);
+    addStatusCommands(app, chosen);
+    addLogCommand(app, chosen);
+    addSettingsCommands(app, chosen);
+    addShareCommands(app, chosen);
+    addChrootCommands(app, chosen);
+    addTokenCommands(app, chosen);
+    addDocumentCommands(app, chosen);
+    addCallCommand(app, chosen);
+}
 
 ExitCode runProgram(const std::vector<std::string>& words, Console& console) {
     CLI::App app("Administers the file-transfer services of a server", "veltctl");
@@ -125,16 +105,6 @@ ExitCode runProgram(const std::vector<std::string>& words, Console& console) {
         return failure.code();
     }
     return ExitCode::done;
-}
-
-std::vector<CommandDescription> describeCommands() {
-    CLI::App app("", "veltctl");
-    GlobalOptions options;
-    Command command;
-    addCommands(app, options, command);
-    std::vector<CommandDescription> found;
-    describeBelow(app, "", found);
-    return found;
 }
 
 } // namespace velt::cli

@@ -2,6 +2,7 @@
 #ifndef VELT_CLI_PROGRAM_H
 #define VELT_CLI_PROGRAM_H
 
+#include "cli/command.h"
 #include "cli/console.h"
 #include "cli/exit_code.h"
 
@@ -14,13 +15,15 @@ namespace velt::cli {
 /// errors and warnings to its error output.
 ExitCode runProgram(const std::vector<std::string>& words, Console& console);
 
-/// Every command as its words ("chroot rules add"), with its options ("--json"): for tests of the manual page
-/// and the completion.
-struct CommandDescription {
-    std::string words;
-    std::vector<std::string> options;
+/// What every command takes.
+struct GlobalOptions {
+    AddressOptions server;
+    bool json = false;
 };
-std::vector<CommandDescription> describeCommands();
+
+/// Adds all commands and options to the parser, which puts what the words name into `options` and `chosen`;
+/// both outlive it.
+void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen);
 
 } // namespace velt::cli
 

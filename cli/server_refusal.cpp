@@ -31,8 +31,7 @@ constexpr Meaning otherRefusal{400, ExitCode::refused, "The server refused the i
 constexpr Meaning noAnswerOfOurs{0, ExitCode::access, "The answer is not from veltd"};
 
 const Meaning& meaningOf(long status) {
-    const auto* const found = std::find_if(std::begin(meanings), std::end(meanings),
-                                           [status](const Meaning& each) { return each.status == status; });
+    const auto* const found = std::ranges::find(meanings, status, &Meaning::status);
     if (found != std::end(meanings)) {
         return *found;
     }

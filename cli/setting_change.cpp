@@ -1,8 +1,8 @@
 #include "cli/setting_change.h"
 
 #include "base/json_value.h"
+#include "base/printable.h"
 #include "cli/json_io.h"
-#include "cli/printable.h"
 
 namespace velt::cli {
 

@@ -2,9 +2,9 @@
 
 #include "base/json_value.h"
 #include "base/number_text.h"
+#include "base/printable.h"
 #include "base/text.h"
 #include "cli/current_settings.h"
-#include "cli/printable.h"
 #include "cli/setting_change.h"
 
 #include <algorithm>

@@ -1,6 +1,6 @@
 #include "cli/text_table.h"
 
-#include "cli/printable.h"
+#include "base/printable.h"
 
 #include <algorithm>
 #include <cstddef>

@@ -1,8 +1,8 @@
 #include "base/json_value.h"
+#include "base/printable.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
-#include "cli/printable.h"
 #include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>

@@ -1,11 +1,11 @@
 #include "host/config.h"
 
 #include "base/file.h"
+#include "base/number_text.h"
 #include "host/api/token_store.h"
 #include "host/base/json.h"
 
 #include <algorithm>
-#include <charconv>
 #include <functional>
 #include <map>
 
@@ -32,12 +32,12 @@ struct Setting {
 };
 
 struct Range {
-    std::size_t least;
-    std::size_t most;
+    std::int64_t least;
+    std::int64_t most;
 };
 
-constexpr Range headBytes{1024, std::size_t{1} << 20U};
-constexpr Range bodyBytes{1024, std::size_t{1} << 30U};
+constexpr Range headBytes{1024, std::int64_t{1} << 20U};
+constexpr Range bodyBytes{1024, std::int64_t{1} << 30U};
 constexpr Range connectionCount{1, 100'000};
 constexpr Range someSeconds{1, 86'400};
 constexpr Range noneOrSomeSeconds{0, 86'400};
@@ -45,14 +45,11 @@ constexpr Range ioThreadCount{1, 64};
 constexpr Range workerCount{1, 256};
 
 std::size_t number(const std::string& text, Range range) {
-    std::size_t value = 0;
-    const char* const end = text.data() + text.size();
-    const auto [stop, error] = std::from_chars(text.data(), end, value);
-    if (error != std::errc() || stop != end || value < range.least || value > range.most) {
-        throw BadValue{"a whole number from " + std::to_string(range.least) + " to " +
-                       std::to_string(range.most)};
+    const auto value = parseNumber(text);
+    if (!value || *value < range.least || *value > range.most) {
+        throw BadValue{numberText(range.least, range.most)};
     }
-    return value;
+    return static_cast<std::size_t>(*value);
 }
 
 const std::string& notEmpty(const std::string& text) {

@@ -1,6 +1,8 @@
 #include "host/api/log_page.h"
 
 #include "base/json_value.h"
+#include "base/number_text.h"
+#include "base/text.h"
 #include "host/api/problem.h"
 #include "host/base/clock.h"
 #include "host/base/percent_encoding.h"
@@ -8,6 +10,7 @@
 #include <algorithm>
 #include <array>
 #include <charconv>
+#include <climits>
 #include <cstdio>
 #include <functional>
 #include <sstream>
@@ -23,25 +26,20 @@ struct BadFilter {
     FieldError error;
 };
 
-template<class Number> std::optional<Number> parseNumber(std::string_view text, int base = 10) {
-    Number value = 0;
-    const char* const end = text.data() + text.size();
-    const auto [stop, error] = std::from_chars(text.data(), end, value, base);
-    return error == std::errc() && stop == end ? std::optional(value) : std::nullopt;
-}
-
-std::optional<std::int64_t> positiveNumber(const std::string& text) {
-    const auto value = parseNumber<std::int64_t>(text);
-    return value && *value > 0 ? value : std::nullopt;
+std::optional<std::int64_t> numberUpTo(std::int64_t most, const std::string& text) {
+    const auto value = parseNumber(text);
+    return value && *value > 0 && *value <= most ? value : std::nullopt;
 }
 
 /// "0x11B00012", or the same number in decimal.
 std::optional<unsigned> eventNumber(const std::string& text) {
-    if (text.starts_with("0x") || text.starts_with("0X")) {
-        return parseNumber<unsigned>(std::string_view(text).substr(2), 16);
+    if (!lowerCase(text).starts_with("0x")) {
+        return numberUpTo(UINT_MAX, text);
     }
-    const auto value = parseNumber<unsigned>(text);
-    return value && *value > 0 ? value : std::nullopt;
+    unsigned value = 0;
+    const char* const end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data() + 2, end, value, 16);
+    return error == std::errc() && stop == end ? std::optional(value) : std::nullopt;
 }
 
 /// HTML forms encode a space as "+".
@@ -75,13 +73,12 @@ constexpr std::array<Filter, 5> filters{{
      }},
     {"before", "the id of an entry",
      [](const std::string& value, LogFilter& filter) {
-         filter.beforeId = positiveNumber(value);
+         filter.beforeId = numberUpTo(INT64_MAX, value);
          return filter.beforeId.has_value();
      }},
     {"limit", "a number from 1 to 1000",
      [](const std::string& value, LogFilter& filter) {
-         const auto limit = positiveNumber(value);
-         filter.limit = static_cast<int>(limit && *limit <= maxLimit ? *limit : 0);
+         filter.limit = static_cast<int>(numberUpTo(maxLimit, value).value_or(0));
          return filter.limit > 0;
      }},
 }};
@@ -91,8 +88,7 @@ void takeFilter(const std::string& key, const std::string& text, LogFilter& filt
     if (!value) {
         throw BadFilter{{key, "a percent-encoded value in UTF-8"}};
     }
-    const auto* const known =
-        std::find_if(filters.begin(), filters.end(), [&key](const Filter& each) { return each.key == key; });
+    const auto* const known = std::ranges::find(filters, key, &Filter::key);
     if (known == filters.end()) {
         throw BadFilter{{key, "one of since, event, actor, before or limit"}};
     }

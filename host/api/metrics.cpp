@@ -32,40 +32,30 @@ std::map<std::string, std::string> labelsOf(const Row& row, const Outcome& outco
 } // namespace
 
 struct Metrics::Families {
+    using Counters = prometheus::Family<prometheus::Counter>&;
+    using Gauges = prometheus::Family<prometheus::Gauge>&;
+
+    Counters counter(const char* name, const char* help) {
+        return prometheus::BuildCounter().Name(name).Help(help).Register(registry);
+    }
+    Gauges gauge(const char* name, const char* help) {
+        return prometheus::BuildGauge().Name(name).Help(help).Register(registry);
+    }
+
     prometheus::Registry registry;
-    prometheus::Family<prometheus::Counter>& requests = prometheus::BuildCounter()
-                                                            .Name("velt_requests_total")
-                                                            .Help("Requests served by a module")
-                                                            .Register(registry);
+    Counters requests = counter("velt_requests_total", "Requests served by a module");
     prometheus::Family<prometheus::Histogram>& durations = prometheus::BuildHistogram()
                                                                .Name("velt_request_duration_seconds")
                                                                .Help("Time that a module took for a request")
                                                                .Register(registry);
-    prometheus::Family<prometheus::Counter>& refusals =
-        prometheus::BuildCounter()
-            .Name("velt_refused_requests_total")
-            .Help("Requests refused before they reached a module")
-            .Register(registry);
-    prometheus::Family<prometheus::Gauge>& wanted = prometheus::BuildGauge()
-                                                        .Name("velt_service_enabled")
-                                                        .Help("Whether a service is switched on")
-                                                        .Register(registry);
-    prometheus::Family<prometheus::Gauge>& up =
-        prometheus::BuildGauge().Name("velt_service_up").Help("Whether a service runs").Register(registry);
-    prometheus::Family<prometheus::Counter>& starts = prometheus::BuildCounter()
-                                                          .Name("velt_daemon_starts_total")
-                                                          .Help("Starts of a service that requests asked for")
-                                                          .Register(registry);
-    prometheus::Family<prometheus::Counter>& restarts =
-        prometheus::BuildCounter()
-            .Name("velt_daemon_restarts_total")
-            .Help("Starts of a daemon after it had ended by itself")
-            .Register(registry);
-    prometheus::Gauge& eventReaders = prometheus::BuildGauge()
-                                          .Name("velt_event_readers")
-                                          .Help("Open streams of events")
-                                          .Register(registry)
-                                          .Add({});
+    Counters refusals =
+        counter("velt_refused_requests_total", "Requests refused before they reached a module");
+    Gauges wanted = gauge("velt_service_enabled", "Whether a service is switched on");
+    Gauges up = gauge("velt_service_up", "Whether a service runs");
+    Counters starts = counter("velt_daemon_starts_total", "Starts of a service that requests asked for");
+    Counters restarts =
+        counter("velt_daemon_restarts_total", "Starts of a daemon after it had ended by itself");
+    prometheus::Gauge& eventReaders = gauge("velt_event_readers", "Open streams of events").Add({});
     std::mutex mutex;
     std::map<std::string, std::uint64_t> seenRestarts;
 };

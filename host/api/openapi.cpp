@@ -1,5 +1,6 @@
 #include "host/api/openapi.h"
 
+#include "base/number_text.h"
 #include "host/api/flat_schema.h"
 #include "host/api/openapi_document.h"
 #include "host/api/schema_words.h"
@@ -39,13 +40,8 @@ Path withoutBrackets(const Path& context) {
 std::string fieldName(const Path& path) {
     std::string name;
     for (const std::string& element : path) {
-        const bool index =
-            std::all_of(element.begin(), element.end(), [](char c) { return c >= '0' && c <= '9'; });
-        if (index) {
-            name += "[" + element + "]";
-        } else {
-            name += (name.empty() ? "" : ".") + element;
-        }
+        const bool isIndex = parseNumber(element).has_value();
+        name += isIndex ? "[" + element + "]" : (name.empty() ? "" : ".") + element;
     }
     return name;
 }
@@ -121,14 +117,12 @@ std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& para
             path.push_back(missing);
         }
         const std::string field = fieldName(path);
-        const bool known = std::any_of(errors.begin(), errors.end(),
-                                       [&field](const FieldError& each) { return each.field == field; });
         // The validator reports the outer schemas of a nested one as well, which adds nothing.
-        const bool holdsOther = std::any_of(errors.begin(), errors.end(), [&field](const FieldError& each) {
-            return field.empty() || each.field.starts_with(field + "[") ||
+        const bool adds = std::ranges::none_of(errors, [&field](const FieldError& each) {
+            return field.empty() || each.field == field || each.field.starts_with(field + "[") ||
                    each.field.starts_with(field + ".");
         });
-        if (!known && !holdsOther) {
+        if (adds) {
             errors.push_back({field, expectationOf(body.source, path)});
         }
     }

@@ -32,8 +32,7 @@ constexpr std::array<Meaning, 6> meanings{{
 }};
 
 const Meaning& meaningOf(int code) {
-    const auto* const found = std::find_if(meanings.begin(), meanings.end(),
-                                           [code](const Meaning& each) { return each.code == code; });
+    const auto* const found = std::ranges::find(meanings, code, &Meaning::code);
     return found == meanings.end() ? otherFailure : *found;
 }
 

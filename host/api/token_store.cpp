@@ -123,7 +123,7 @@ std::vector<Token> TokenStore::tokens() const {
 std::optional<Token> TokenStore::find(const std::string& token) const {
     const std::string hash = sha256(token);
     const std::lock_guard lock(mutex_);
-    const auto found = std::find_if(tokens_.begin(), tokens_.end(), [&hash](const Token& each) {
+    const auto found = std::ranges::find_if(tokens_, [&hash](const Token& each) {
         return each.hash.size() == hash.size() &&
                CRYPTO_memcmp(each.hash.data(), hash.data(), hash.size()) == 0;
     });

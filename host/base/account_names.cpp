@@ -13,44 +13,36 @@ namespace {
 constexpr std::size_t firstSize = 4096;
 constexpr std::size_t largestSize = std::size_t{1} << 24U;
 
-/// Repeats a look-up with a larger buffer until the record fits; that of a group lists all members.
-template<class LookUp> int withRoom(std::vector<char>& buffer, const LookUp& lookUp) {
-    buffer.resize(firstSize);
-    int error = lookUp();
-    while (error == ERANGE && buffer.size() < largestSize) {
-        buffer.resize(buffer.size() * 2);
-        error = lookUp();
+/// The field of the record that the function finds under the key. The record of a group lists all members, so
+/// the buffer grows until it fits.
+template<class Value, class Record, class Key, class Field>
+std::optional<Value> lookUp(int (*function)(Key, Record*, char*, std::size_t, Record**), Key key,
+                            Field Record::*field) {
+    Record record{};
+    Record* found = nullptr;
+    int error = ERANGE;
+    for (std::size_t size = firstSize; error == ERANGE && size <= largestSize; size *= 2) {
+        std::vector<char> buffer(size);
+        error = function(key, &record, buffer.data(), buffer.size(), &found);
+        if (error == 0 && found != nullptr) {
+            return record.*field;
+        }
     }
-    return error;
+    return std::nullopt;
 }
 
 } // namespace
 
 std::string userName(uid_t uid) {
-    std::vector<char> buffer;
-    passwd record{};
-    passwd* found = nullptr;
-    const int error =
-        withRoom(buffer, [&] { return getpwuid_r(uid, &record, buffer.data(), buffer.size(), &found); });
-    return error == 0 && found != nullptr ? found->pw_name : "uid " + std::to_string(uid);
+    return lookUp<std::string>(getpwuid_r, uid, &passwd::pw_name).value_or("uid " + std::to_string(uid));
 }
 
 std::string groupName(gid_t gid) {
-    std::vector<char> buffer;
-    group record{};
-    group* found = nullptr;
-    const int error =
-        withRoom(buffer, [&] { return getgrgid_r(gid, &record, buffer.data(), buffer.size(), &found); });
-    return error == 0 && found != nullptr ? found->gr_name : "gid " + std::to_string(gid);
+    return lookUp<std::string>(getgrgid_r, gid, &group::gr_name).value_or("gid " + std::to_string(gid));
 }
 
 std::optional<gid_t> groupNamed(const std::string& name) {
-    std::vector<char> buffer;
-    group record{};
-    group* found = nullptr;
-    const int error = withRoom(
-        buffer, [&] { return getgrnam_r(name.c_str(), &record, buffer.data(), buffer.size(), &found); });
-    return error == 0 && found != nullptr ? std::optional(found->gr_gid) : std::nullopt;
+    return lookUp<gid_t>(getgrnam_r, name.c_str(), &group::gr_gid);
 }
 
 } // namespace velt::host

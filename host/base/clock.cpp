@@ -1,8 +1,8 @@
 #include "host/base/clock.h"
 
+#include "base/number_text.h"
+
 #include <array>
-#include <charconv>
-#include <cstdint>
 #include <cstdio>
 #include <ctime>
 
@@ -46,11 +46,8 @@ std::string timestamp(TimePoint time) {
 }
 
 std::optional<TimePoint> parseTimestamp(const std::string& text) {
-    std::int64_t seconds = 0;
-    const char* const end = text.data() + text.size();
-    if (const auto [stop, error] = std::from_chars(text.data(), end, seconds);
-        error == std::errc() && stop == end && seconds >= 0 && seconds < 100'000'000'000) {
-        return TimePoint(std::chrono::seconds(seconds));
+    if (const auto seconds = parseNumber(text); seconds && *seconds >= 0 && *seconds < 100'000'000'000) {
+        return TimePoint(std::chrono::seconds(*seconds));
     }
     std::tm parts{};
     const char* rest = strptime(text.c_str(), "%Y-%m-%dT%H:%M:%S", &parts);

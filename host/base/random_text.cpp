@@ -1,5 +1,7 @@
 #include "host/base/random_text.h"
 
+#include "base/text.h"
+
 #include <sys/random.h>
 
 #include <array>
@@ -7,14 +9,12 @@
 #include <cerrno>
 #include <cstdint>
 #include <cstdio>
-#include <string_view>
 #include <system_error>
-#include <vector>
 
 namespace velt::host {
 
 std::string randomHexadecimal(std::size_t bytes) {
-    std::vector<unsigned char> buffer(bytes);
+    std::string buffer(bytes, '\0');
     std::size_t filled = 0;
     while (filled < bytes) {
         const ssize_t count = getrandom(buffer.data() + filled, bytes - filled, 0);
@@ -23,13 +23,7 @@ std::string randomHexadecimal(std::size_t bytes) {
         }
         filled += count > 0 ? static_cast<std::size_t>(count) : 0;
     }
-    constexpr std::string_view digits = "0123456789abcdef";
-    std::string text;
-    for (const unsigned char byte : buffer) {
-        text += digits[byte >> 4U];
-        text += digits[byte & 0xFU];
-    }
-    return text;
+    return hexadecimal(buffer);
 }
 
 std::string nextRequestId() {

@@ -1,5 +1,6 @@
 #include "host/http/listener.h"
 
+#include "base/file.h"
 #include "host/base/account_names.h"
 
 #include <arpa/inet.h>
@@ -9,7 +10,6 @@
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <array>
@@ -25,10 +25,6 @@ namespace velt::host {
 namespace {
 
 constexpr int backlog = 512;
-
-std::string systemError() {
-    return std::generic_category().message(errno);
-}
 
 const sockaddr* generic(const void* address) {
     return static_cast<const sockaddr*>(address);
@@ -127,10 +123,8 @@ sockaddr_un unixAddress(const std::filesystem::path& path) {
 
 /// Whether a process accepts connections there.
 bool answers(const sockaddr_un& address) {
-    const int descriptor = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
-    const bool connected = connect(descriptor, generic(&address), sizeof address) == 0 || errno == EAGAIN;
-    close(descriptor);
-    return connected;
+    const UniqueFd caller(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+    return connect(caller.get(), generic(&address), sizeof address) == 0 || errno == EAGAIN;
 }
 
 void removeStale(const std::filesystem::path& path, const sockaddr_un& address) {
@@ -152,8 +146,7 @@ void giveToGroup(const std::filesystem::path& path, const std::string& name) {
     const bool given = !group || lchown(path.c_str(), static_cast<uid_t>(-1), *group) == 0;
     // A user outside the group cannot give it the socket. Such a user runs a host for personal use.
     if (!given && (errno != EPERM || geteuid() == 0)) {
-        throw ListenError("Cannot give " + path.string() + " to the group " + name + ": " + systemError() +
-                          ".");
+        throw ListenError(cannot("give", path.string() + " to the group " + name).message);
     }
 }
 
@@ -174,23 +167,12 @@ void readCredentials(int descriptor, Peer& peer) {
 
 } // namespace
 
-const int Listener::familyUnix = AF_UNIX;
-
-Listener::Listener(int descriptor, int family, std::filesystem::path path)
-    : descriptor_(descriptor), family_(family), path_(std::move(path)) {}
-
-Listener::Listener(Listener&& other) noexcept
-    : descriptor_(std::exchange(other.descriptor_, -1)), family_(other.family_),
-      path_(std::move(other.path_)) {
-    other.path_.clear();
-}
+Listener::Listener(int descriptor)
+    : descriptor_(descriptor), isUnixSocket_(familyOf(descriptor) == AF_UNIX) {}
 
 Listener::~Listener() {
-    if (descriptor_ >= 0) {
-        close(descriptor_);
-        if (!path_.empty()) {
-            unlink(path_.c_str());
-        }
+    if (descriptor_ && !path_.empty()) {
+        unlink(path_.c_str());
     }
 }
 
@@ -205,13 +187,12 @@ Listener Listener::tcp(const std::string& address, bool allowRemote) {
     }
     const std::unique_ptr<addrinfo, decltype(&freeaddrinfo)> owner(list, freeaddrinfo);
     checkReach(address, list->ai_addr, list->ai_addrlen, allowRemote);
-    Listener listener(socket(list->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0), list->ai_family,
-                      {});
+    Listener listener(socket(list->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
     const int on = 1;
-    setsockopt(listener.descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
-    if (bind(listener.descriptor_, list->ai_addr, list->ai_addrlen) != 0 ||
-        listen(listener.descriptor_, backlog) != 0) {
-        throw ListenError("Cannot listen on " + address + ": " + systemError() + ".");
+    setsockopt(listener.descriptor(), SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    if (bind(listener.descriptor(), list->ai_addr, list->ai_addrlen) != 0 ||
+        listen(listener.descriptor(), backlog) != 0) {
+        throw ListenError(cannot("listen on", address).message);
     }
     return listener;
 }
@@ -221,20 +202,19 @@ Listener Listener::unixSocket(const std::filesystem::path& path, const std::stri
     std::filesystem::create_directories(path.parent_path(), error);
     const sockaddr_un address = unixAddress(path);
     removeStale(path, address);
-    Listener listener(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0), AF_UNIX, {});
+    Listener listener(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
     // With the right mode from the start, nobody can connect too early.
     const mode_t former = umask(0117);
-    const int bound = bind(listener.descriptor_, generic(&address), sizeof address);
+    const int bound = bind(listener.descriptor(), generic(&address), sizeof address);
     const int reason = errno;
     umask(former);
     if (bound != 0) {
-        errno = reason;
-        throw ListenError("Cannot listen on " + path.string() + ": " + systemError() + ".");
+        throw ListenError(cannot("listen on", path, reason).message);
     }
     listener.path_ = path;
     giveToGroup(path, group);
-    if (listen(listener.descriptor_, backlog) != 0) {
-        throw ListenError("Cannot listen on " + path.string() + ": " + systemError() + ".");
+    if (listen(listener.descriptor(), backlog) != 0) {
+        throw ListenError(cannot("listen on", path).message);
     }
     return listener;
 }
@@ -255,7 +235,7 @@ std::vector<Listener> Listener::inherited(bool allowRemote) {
         }
         fcntl(descriptor, F_SETFD, FD_CLOEXEC);
         fcntl(descriptor, F_SETFL, fcntl(descriptor, F_GETFL) | O_NONBLOCK);
-        listeners.push_back(Listener(descriptor, familyOf(descriptor), {}));
+        listeners.push_back(Listener(descriptor));
         if (!listeners.back().isUnixSocket()) {
             const SocketName name = socketName(descriptor, getsockname);
             checkReach(listeners.back().name(), generic(&name.address), name.size, allowRemote);
@@ -266,17 +246,18 @@ std::vector<Listener> Listener::inherited(bool allowRemote) {
 
 std::string Listener::name() const {
     if (isUnixSocket()) {
-        const SocketName name = socketName(descriptor_, getsockname);
+        const SocketName name = socketName(descriptor(), getsockname);
         sockaddr_un address{};
         std::memcpy(&address, &name.address, std::min(sizeof address, static_cast<std::size_t>(name.size)));
         return static_cast<const char*>(address.sun_path);
     }
-    const auto [address, port] = nameOf(descriptor_, getsockname);
-    return (family_ == AF_INET6 ? "[" + address + "]" : address) + ":" + std::to_string(port);
+    const auto [address, port] = nameOf(descriptor(), getsockname);
+    const bool isVersion6 = address.find(':') != std::string::npos;
+    return (isVersion6 ? "[" + address + "]" : address) + ":" + std::to_string(port);
 }
 
 unsigned short Listener::port() const {
-    return isUnixSocket() ? static_cast<unsigned short>(0) : nameOf(descriptor_, getsockname).second;
+    return isUnixSocket() ? static_cast<unsigned short>(0) : nameOf(descriptor(), getsockname).second;
 }
 
 Peer peerOf(int descriptor, bool isTls) {

@@ -2,6 +2,7 @@
 #ifndef VELT_HOST_HTTP_LISTENER_H
 #define VELT_HOST_HTTP_LISTENER_H
 
+#include "base/unique_fd.h"
 #include "host/http/message.h"
 
 #include <filesystem>
@@ -32,25 +33,23 @@ public:
     /// for tcp(). Throws ListenError.
     static std::vector<Listener> inherited(bool allowRemote);
 
-    Listener(Listener&& other) noexcept;
+    Listener(Listener&&) noexcept = default;
     Listener& operator=(Listener&&) = delete;
     Listener(const Listener&) = delete;
     ~Listener();
 
-    int descriptor() const { return descriptor_; }
-    bool isUnixSocket() const { return family_ == familyUnix; }
+    int descriptor() const { return descriptor_.get(); }
+    bool isUnixSocket() const { return isUnixSocket_; }
 
     /// "127.0.0.1:8080", or the path.
     std::string name() const;
     unsigned short port() const; ///< 0 for a Unix socket
 
 private:
-    static const int familyUnix;
+    explicit Listener(int descriptor);
 
-    Listener(int descriptor, int family, std::filesystem::path path);
-
-    int descriptor_;
-    int family_;
+    UniqueFd descriptor_;
+    bool isUnixSocket_;
     std::filesystem::path path_; ///< to unlink in the destructor; "" for none
 };
 

@@ -51,8 +51,7 @@ const char* reasonPhrase(int status) {
         {503, "Service Unavailable"},
         {505, "HTTP Version Not Supported"},
     }};
-    const auto* const found = std::find_if(phrases.begin(), phrases.end(),
-                                           [status](const auto& each) { return each.first == status; });
+    const auto* const found = std::ranges::find(phrases, status, &std::pair<int, const char*>::first);
     return found == phrases.end() ? "Unknown" : found->second;
 }
 

@@ -1,7 +1,8 @@
 #include "host/module/module_log.h"
 
+#include "base/text.h"
+
 #include <algorithm>
-#include <cctype>
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
@@ -30,10 +31,7 @@ __attribute__((format(printf, 1, 0))) std::string rendered(const char* format, v
     std::string text(static_cast<std::size_t>(std::max(size, 0)) + 1, '\0');
     std::vsnprintf(text.data(), text.size(), format, arguments);
     text.pop_back();
-    while (!text.empty() && text.back() == '\n') {
-        text.pop_back();
-    }
-    return text;
+    return std::string(trimmedEnd(text, "\n"));
 }
 
 __attribute__((format(printf, 2, 0))) void write(int priority, const char* format, va_list arguments) {
@@ -56,15 +54,12 @@ __attribute__((format(printf, 2, 0))) void write(int priority, const char* forma
 
 /// What follows "source:line " at the start of a line.
 std::string withoutSource(const std::string& line) {
-    const std::size_t space = line.find(' ');
-    const std::size_t colon = line.find(':');
-    if (space == std::string::npos || colon > space || colon + 1 == space) {
-        return line;
-    }
-    const bool number = std::all_of(line.begin() + static_cast<std::ptrdiff_t>(colon) + 1,
-                                    line.begin() + static_cast<std::ptrdiff_t>(space),
-                                    [](unsigned char c) { return std::isdigit(c) != 0; });
-    return number ? line.substr(space + 1) : line;
+    std::string_view rest = line;
+    std::string_view place = cut(rest, ' ');
+    cut(place, ':');
+    const bool isLine =
+        !rest.empty() && place.find_first_not_of("0123456789") == std::string_view::npos && !place.empty();
+    return isLine ? std::string(rest) : line;
 }
 
 } // namespace

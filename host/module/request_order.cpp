@@ -55,19 +55,11 @@ bool RequestOrder::mayStart(Kind kind) const {
     return kind == Kind::unordered || (!writing_ && (kind == Kind::read || reading_ == 0));
 }
 
-void RequestOrder::started(Kind kind) {
+void RequestOrder::note(Kind kind, bool runs) {
     if (kind == Kind::read) {
-        ++reading_;
+        reading_ += runs ? 1 : -1;
     } else if (kind == Kind::write) {
-        writing_ = true;
-    }
-}
-
-void RequestOrder::finished(Kind kind) {
-    if (kind == Kind::read) {
-        --reading_;
-    } else if (kind == Kind::write) {
-        writing_ = false;
+        writing_ = runs;
     }
 }
 
@@ -83,14 +75,14 @@ void RequestOrder::work(Pool& pool) {
         }
         Waiting next = std::move(pool.queue.front());
         pool.queue.pop_front();
-        started(next.kind);
+        note(next.kind, true);
         lock.unlock();
         // The next one may be a read that can run at the same time.
         pool.changed.notify_one();
         next.task();
         next.task = nullptr;
         lock.lock();
-        finished(next.kind);
+        note(next.kind, false);
         pool.changed.notify_all();
     }
 }

@@ -54,8 +54,7 @@ private:
 
     void work(Pool& pool);
     bool mayStart(Kind kind) const;
-    void started(Kind kind);
-    void finished(Kind kind);
+    void note(Kind kind, bool runs);
 
     const std::size_t maxWaiting_;
     std::mutex mutex_;

@@ -20,6 +20,11 @@ TEST(Text, HasASmallForm) {
     EXPECT_EQ(lowerCase(""), "");
 }
 
+TEST(Text, ShowsBytesInHexadecimal) {
+    EXPECT_EQ(hexadecimal(std::string_view("\0\x0a\xff", 3)), "000aff");
+    EXPECT_EQ(hexadecimal(""), "");
+}
+
 TEST(Text, IsCutAtASeparator) {
     std::string_view rest = "a,,b";
     EXPECT_EQ(cut(rest, ','), "a");

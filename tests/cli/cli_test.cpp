@@ -2,6 +2,8 @@
 
 #include "cli/console.h"
 
+#include <CLI/CLI.hpp>
+
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/wait.h>
@@ -112,4 +114,31 @@ RunResult runProcess(const std::vector<std::string>& arguments, const std::vecto
         throw std::runtime_error("cannot run " + words.front());
     }
     return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), contentOf(out), contentOf(err)};
+}
+
+namespace {
+
+void describeBelow(const CLI::App& app, const std::string& words, std::vector<CommandDescription>& found) {
+    CommandDescription description{words, {}};
+    for (const CLI::Option* option : app.get_options()) {
+        for (const std::string& name : option->get_lnames()) {
+            description.options.push_back("--" + name);
+        }
+    }
+    found.push_back(description);
+    for (const CLI::App* child : app.get_subcommands([](const CLI::App*) { return true; })) {
+        describeBelow(*child, words.empty() ? child->get_name() : words + " " + child->get_name(), found);
+    }
+}
+
+} // namespace
+
+std::vector<CommandDescription> describeCommands() {
+    CLI::App app("", "veltctl");
+    velt::cli::GlobalOptions options;
+    velt::cli::Command command;
+    velt::cli::addCommands(app, options, command);
+    std::vector<CommandDescription> found;
+    describeBelow(app, "", found);
+    return found;
 }

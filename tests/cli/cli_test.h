@@ -60,6 +60,13 @@ protected:
     bool interrupted = false;
 };
 
+/// Every command as its words ("chroot rules add"), with its options ("--json").
+struct CommandDescription {
+    std::string words;
+    std::vector<std::string> options;
+};
+std::vector<CommandDescription> describeCommands();
+
 /// Runs a program and waits for it; its environment is `environment` alone.
 RunResult runProcess(const std::vector<std::string>& arguments, const std::vector<std::string>& environment);
 

@@ -55,11 +55,11 @@ Words keysOf(const velt::cli::SettingGroup& group) {
 } // namespace
 
 TEST(CompletionTest, EveryCommandOffersTheCommandsBelowIt) {
-    const std::vector<velt::cli::CommandDescription> commands = velt::cli::describeCommands();
-    for (const velt::cli::CommandDescription& command : commands) {
+    const std::vector<CommandDescription> commands = describeCommands();
+    for (const CommandDescription& command : commands) {
         Words below;
         const std::string start = command.words.empty() ? "" : command.words + " ";
-        for (const velt::cli::CommandDescription& other : commands) {
+        for (const CommandDescription& other : commands) {
             const bool isBelow = other.words.size() > start.size() && other.words.rfind(start, 0) == 0;
             if (isBelow && other.words.find(' ', start.size()) == std::string::npos) {
                 below.push_back(other.words.substr(start.size()));
@@ -73,9 +73,9 @@ TEST(CompletionTest, EveryCommandOffersTheCommandsBelowIt) {
 }
 
 TEST(CompletionTest, EveryCommandOffersItsOptions) {
-    const std::vector<velt::cli::CommandDescription> commands = velt::cli::describeCommands();
+    const std::vector<CommandDescription> commands = describeCommands();
     const Words everywhere = commands.front().options; // the program's own
-    for (const velt::cli::CommandDescription& command : commands) {
+    for (const CommandDescription& command : commands) {
         Words expected = with(command.options, everywhere);
         if (!command.words.empty()) {
             std::erase(expected, "--version");

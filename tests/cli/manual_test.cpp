@@ -32,9 +32,9 @@ TEST(ManualTest, ThePagesHaveNoErrors) {
 
 TEST(ManualTest, ThePageNamesEveryCommandAndOption) {
     const std::string page = rendered();
-    const std::vector<velt::cli::CommandDescription> commands = velt::cli::describeCommands();
+    const std::vector<CommandDescription> commands = describeCommands();
     ASSERT_GT(commands.size(), 25U);
-    for (const velt::cli::CommandDescription& command : commands) {
+    for (const CommandDescription& command : commands) {
         EXPECT_NE(page.find(command.words), std::string::npos) << command.words;
         for (const std::string& option : command.options) {
             EXPECT_NE(page.find(option), std::string::npos) << command.words << " " << option;

@@ -5,7 +5,7 @@
 using ProgramTest = CliTest;
 
 TEST_F(ProgramTest, EveryCommandExplainsItself) {
-    for (const velt::cli::CommandDescription& command : velt::cli::describeCommands()) {
+    for (const CommandDescription& command : describeCommands()) {
         Words words;
         std::string word;
         for (const char c : command.words + " ") {
@@ -36,7 +36,7 @@ TEST_F(ProgramTest, TheHelpOfSetNamesTheFormOfItsArguments) {
 
 TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
     std::vector<std::string> words;
-    for (const velt::cli::CommandDescription& command : velt::cli::describeCommands()) {
+    for (const CommandDescription& command : describeCommands()) {
         words.push_back(command.words);
     }
     std::sort(words.begin(), words.end());

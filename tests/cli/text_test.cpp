@@ -1,7 +1,7 @@
 #include "base/json_text.h"
+#include "base/printable.h"
 #include "cli/http_client.h"
 #include "cli/json_io.h"
-#include "cli/printable.h"
 #include "cli/text_table.h"
 #include "cli/time_text.h"
 
@@ -11,6 +11,7 @@
 
 using namespace velt::cli;
 using velt::parseJson;
+using velt::printable;
 
 TEST(TextTest, ControlCharactersCannotReachATerminal) {
     EXPECT_EQ(printable("plain \xC3\xBC"), "plain \xC3\xBC");

@@ -1,25 +1,21 @@
-#include "cli/printable.h"
+#include "base/printable.h"
 
-namespace velt::cli {
+#include "base/text.h"
+
+namespace velt {
 
 namespace {
 
-void appendHex(std::string& text, unsigned char byte) {
-    static const char* const digits = "0123456789abcdef";
-    text += digits[byte >> 4U];
-    text += digits[byte & 0x0FU];
-}
-
 // Control characters below `c0End` and from DEL to U+009F, which is two bytes in UTF-8, as hexadecimal.
-std::string escapeControls(const std::string& text, unsigned char c0End, const char* prefix) {
+std::string escapeControls(std::string_view text, unsigned char c0End, const std::string& prefix) {
     std::string result;
     for (std::size_t i = 0; i < text.size(); ++i) {
         const auto byte = static_cast<unsigned char>(text[i]);
         const bool c1 = byte == 0xC2 && i + 1 < text.size() && static_cast<unsigned char>(text[i + 1]) < 0xA0;
         if (c1) {
-            appendHex(result += prefix, static_cast<unsigned char>(text[++i]));
+            result += prefix + hexadecimal({&text[++i], 1});
         } else if (byte < c0End || byte == 0x7F) {
-            appendHex(result += prefix, byte);
+            result += prefix + hexadecimal({&text[i], 1});
         } else {
             result += text[i];
         }
@@ -29,7 +25,7 @@ std::string escapeControls(const std::string& text, unsigned char c0End, const c
 
 } // namespace
 
-std::string printable(const std::string& text) {
+std::string printable(std::string_view text) {
     return escapeControls(text, 0x20, "\\x");
 }
 
@@ -37,4 +33,4 @@ std::string printableJson(const std::string& json) {
     return escapeControls(json, 0, "\\u00");
 }
 
-} // namespace velt::cli
+} // namespace velt
