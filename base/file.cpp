@@ -36,8 +36,7 @@ Result<> makeFolder(const fs::path& folder) {
     for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
         if (::mkdir(at->c_str(), 0755) != 0 && errno != EEXIST)
             return cannot("make the folder", *at);
-        if (auto synced = syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")); !synced)
-            return synced;
+        VELT_RETURN_IF_ERROR(syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")));
     }
     return {};
 }
@@ -87,8 +86,7 @@ bool isSameFile(int fd, const fs::path& path) {
 
 Result<> replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
     const fs::path folder = path.has_parent_path() ? path.parent_path() : fs::path(".");
-    if (auto made = makeFolder(folder); !made)
-        return made;
+    VELT_RETURN_IF_ERROR(makeFolder(folder));
     fs::path temporary = folder / ".";
     temporary += path.filename();
     temporary += ".new";
@@ -130,12 +128,10 @@ Result<std::optional<std::string>> readOptionalFile(const fs::path& path) {
 }
 
 Result<std::string> readFile(const fs::path& path) {
-    auto contents = readOptionalFile(path);
+    VELT_ASSIGN_OR_RETURN(auto contents, readOptionalFile(path));
     if (!contents)
-        return contents.error();
-    if (!*contents)
         return cannot("read", path, ENOENT);
-    return std::move(**contents);
+    return std::move(*contents);
 }
 
 } // namespace velt

@@ -38,9 +38,7 @@ struct Error {
 /// A value, or the Error that kept it from being made. What can fail and gives nothing returns a Result<>. A
 /// value that is not there may not be asked for, nor an error.
 ///
-///     Result<std::string> text = readFile(path);
-///     if (!text)
-///         return text.error();
+///     VELT_ASSIGN_OR_RETURN(const std::string text, readFile(path));
 template<class Value = void> class [[nodiscard]] Result {
 public:
     Result(Value value) : outcome_(std::move(value)) {}
@@ -79,5 +77,28 @@ private:
 };
 
 } // namespace velt
+
+// A name of its own for each use, since an expression may hold a lambda that uses these macros too.
+#define VELT_RESULT_NAME_OF(number) veltResult##number
+#define VELT_RESULT_NAME(number) VELT_RESULT_NAME_OF(number)
+
+/// Declares a variable with the value of a Result, or returns its error, unchanged, from the function, which
+/// has to give a Result as well. Two statements: not for the branch of an `if` without braces.
+#define VELT_ASSIGN_OR_RETURN(declaration, ...)                                                              \
+    VELT_ASSIGN_OR_RETURN_BY(VELT_RESULT_NAME(__COUNTER__), declaration, __VA_ARGS__)
+#define VELT_ASSIGN_OR_RETURN_BY(result, declaration, ...)                                                   \
+    auto result = (__VA_ARGS__);                                                                             \
+    if (!result)                                                                                             \
+        return std::move(result.error());                                                                    \
+    declaration = std::move(*result)
+
+/// Returns the error of a Result<>, unchanged, from the function, which has to give a Result as well. What
+/// gives a value does not compile: it may be a lock, which would end at once.
+#define VELT_RETURN_IF_ERROR(...) VELT_RETURN_IF_ERROR_BY(VELT_RESULT_NAME(__COUNTER__), __VA_ARGS__)
+#define VELT_RETURN_IF_ERROR_BY(result, ...)                                                                 \
+    do {                                                                                                     \
+        if (velt::Result<> result = (__VA_ARGS__); !result)                                                  \
+            return std::move(result.error());                                                                \
+    } while (false)
 
 #endif

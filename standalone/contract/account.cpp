@@ -56,27 +56,21 @@ VELT_GROUP* internGroup(velt::GroupEntry group) {
 constexpr auto largestId = static_cast<unsigned>(std::numeric_limits<int>::max());
 
 velt::Result<VELT_USER*> lookUpUser(const char* name) {
-    velt::Result<velt::UserEntry> user = velt::findUser(name);
-    if (!user) {
-        return user.error();
-    }
-    if (user->uid > largestId) {
+    VELT_ASSIGN_OR_RETURN(velt::UserEntry user, velt::findUser(name));
+    if (user.uid > largestId) {
         return velt::Error(velt::ErrorNumber::invalid,
-                           "The number of user \"" + user->name + "\" is too large.");
+                           "The number of user \"" + user.name + "\" is too large.");
     }
-    return internUser(std::move(*user));
+    return internUser(std::move(user));
 }
 
 velt::Result<VELT_GROUP*> lookUpGroup(const char* name) {
-    velt::Result<velt::GroupEntry> group = velt::findGroup(name);
-    if (!group) {
-        return group.error();
-    }
-    if (group->gid > largestId) {
+    VELT_ASSIGN_OR_RETURN(velt::GroupEntry group, velt::findGroup(name));
+    if (group.gid > largestId) {
         return velt::Error(velt::ErrorNumber::invalid,
-                           "The number of group \"" + group->name + "\" is too large.");
+                           "The number of group \"" + group.name + "\" is too large.");
     }
-    return internGroup(std::move(*group));
+    return internGroup(std::move(group));
 }
 
 template<class Record> int get(velt::Result<Record*> (&lookUp)(const char*), const char* name, Record** out) {
@@ -84,11 +78,7 @@ template<class Record> int get(velt::Result<Record*> (&lookUp)(const char*), con
         if (name == nullptr || out == nullptr) {
             return velt::Error(velt::ErrorNumber::invalid, "A look-up of an account needs a name.");
         }
-        const velt::Result<Record*> record = lookUp(name);
-        if (!record) {
-            return record.error();
-        }
-        *out = *record;
+        VELT_ASSIGN_OR_RETURN(*out, lookUp(name));
         return {};
     });
 }

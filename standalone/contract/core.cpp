@@ -42,9 +42,7 @@ bool isBlank(std::string_view text) {
 }
 
 Result<> writeSystemInformation(std::string_view key, std::string_view value) {
-    const auto lock = StateLock::take();
-    if (!lock)
-        return lock.error();
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     return perform(Effect::store, "system information",
                    [&] { return writeKeyValue(statePath(paths::systemInformation), key, value); });
 }

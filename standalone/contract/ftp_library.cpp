@@ -17,10 +17,8 @@ namespace {
 
 template<class Value> int readSetting(Value FtpSettings::*setting) {
     return atBoundary([&]() -> Result<int> {
-        const Result<FtpSettings> settings = loadFtpFile();
-        if (!settings)
-            return settings.error();
-        return static_cast<int>((*settings).*setting);
+        VELT_ASSIGN_OR_RETURN(const FtpSettings settings, loadFtpFile());
+        return static_cast<int>(settings.*setting);
     });
 }
 
@@ -36,10 +34,8 @@ LastSeen<_tag_VELT_FTP_CONF_>& lastSeenRecord() {
 
 Result<> readRecord(_tag_VELT_FTP_CONF_& record) {
     lastSeenRecord().forget();
-    const Result<FtpSettings> settings = loadFtpFile();
-    if (!settings)
-        return settings.error();
-    record = settings->record;
+    VELT_ASSIGN_OR_RETURN(const FtpSettings settings, loadFtpFile());
+    record = settings.record;
     lastSeenRecord().note(record);
     return {};
 }
@@ -82,11 +78,9 @@ constexpr int offeredToFtp = 0x207;
 Result<std::vector<std::string>> shareNames(int selection) {
     if (selection != offeredToFtp)
         return Error(ErrorNumber::invalid, "Only the shares that are offered to FTP can be listed.");
-    const auto shares = loadShares();
-    if (!shares)
-        return shares.error();
+    VELT_ASSIGN_OR_RETURN(const auto shares, loadShares());
     std::vector<std::string> names;
-    for (const ShareEntry& share : *shares)
+    for (const ShareEntry& share : shares)
         if (share.offeredToFtp)
             names.push_back(share.name);
     return names;
@@ -97,11 +91,9 @@ UserFilter filterOf(int source, const char* substr, const char* domain) {
 }
 
 Result<std::vector<std::string>> ruleLines() {
-    const auto rules = loadRules();
-    if (!rules)
-        return rules.error();
+    VELT_ASSIGN_OR_RETURN(const auto rules, loadRules());
     std::vector<std::string> lines;
-    for (const ChrootRule& rule : *rules)
+    for (const ChrootRule& rule : rules)
         lines.push_back(formatRule(rule));
     return lines;
 }
@@ -130,22 +122,18 @@ Result<> splitRule(const char* line, int* isUser, char* name, int nameSize, char
     const auto rule = parseRule(line != nullptr ? line : "");
     if (!rule)
         return Error(rule.error().number, "Cannot read the chroot rule: " + rule.error().message + ".");
-    const auto owner = ownerOf(*rule);
-    if (!owner)
-        return owner.error();
-    if (!fits(*owner, nameSize) || !fits(rule->path, pathSize))
-        return Error(ErrorNumber::invalid, "The chroot rule of " + *owner + " is too long.");
+    VELT_ASSIGN_OR_RETURN(const auto owner, ownerOf(*rule));
+    if (!fits(owner, nameSize) || !fits(rule->path, pathSize))
+        return Error(ErrorNumber::invalid, "The chroot rule of " + owner + " is too long.");
     *isUser = rule->isUser ? 1 : 0;
-    copyText(*owner, name);
+    copyText(owner, name);
     copyText(rule->path, path);
     return {};
 }
 
 Result<> writeRule(char* buffer, int size, bool isUser, int id, const char* path) {
-    const auto rule = makeRule(isUser, id, path != nullptr ? path : "");
-    if (!rule)
-        return rule.error();
-    const std::string line = formatRule(*rule);
+    VELT_ASSIGN_OR_RETURN(const auto rule, makeRule(isUser, id, path != nullptr ? path : ""));
+    const std::string line = formatRule(rule);
     if (!fits(line, size))
         return Error(ErrorNumber::invalid, "The path of the chroot rule is too long.");
     copyText(line, buffer);

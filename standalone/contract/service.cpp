@@ -30,8 +30,8 @@ Result<const Daemon*> findDaemon(const char* service) {
 /// Does `act` with the daemon behind the name, as the effect of that name.
 int affect(Effect effect, const char* service, const std::function<Result<>(const Daemon&)>& act) {
     return atBoundary([&]() -> Result<> {
-        const auto daemon = findDaemon(service);
-        return daemon ? perform(effect, service, [&] { return act(**daemon); }) : daemon.error();
+        VELT_ASSIGN_OR_RETURN(const Daemon* const daemon, findDaemon(service));
+        return perform(effect, service, [&] { return act(*daemon); });
     });
 }
 
@@ -47,15 +47,9 @@ int setRunKey(const char* service, int value) {
 }
 
 Result<int> isEnabled(const char* service) {
-    const auto daemon = findDaemon(service);
-    if (!daemon) {
-        return daemon.error();
-    }
-    const auto settings = (*daemon)->settings();
-    if (!settings) {
-        return settings.error();
-    }
-    return isOn(**daemon, *settings, service) ? 1 : 0;
+    VELT_ASSIGN_OR_RETURN(const Daemon* const daemon, findDaemon(service));
+    VELT_ASSIGN_OR_RETURN(const auto settings, daemon->settings());
+    return isOn(*daemon, settings, service) ? 1 : 0;
 }
 
 } // namespace

@@ -16,13 +16,11 @@ LastSeen<SftpSettings>& lastSeenSettings() {
 
 Result<> readRecord(_tag_VELT_SFTP_CONFIG_& record) {
     lastSeenSettings().forget();
-    const Result<SftpSettings> settings = loadSftpSettings();
-    if (!settings)
-        return settings.error();
+    VELT_ASSIGN_OR_RETURN(const SftpSettings settings, loadSftpSettings());
     record = _tag_VELT_SFTP_CONFIG_{};
-    record.enable = settings->enabled ? 1 : 0;
-    record.port = settings->port;
-    lastSeenSettings().note(*settings);
+    record.enable = settings.enabled ? 1 : 0;
+    record.port = settings.port;
+    lastSeenSettings().note(settings);
     return {};
 }
 

@@ -25,12 +25,9 @@ Result<> find(const char* name, VELT_SHARE** out) {
     if (name == nullptr || out == nullptr) {
         return Error(ErrorNumber::invalid, "A share look-up needs a name.");
     }
-    auto shares = loadShares();
-    if (!shares) {
-        return shares.error();
-    }
-    const auto found = std::ranges::find(*shares, name, &ShareEntry::name);
-    if (found == shares->end()) {
+    VELT_ASSIGN_OR_RETURN(auto shares, loadShares());
+    const auto found = std::ranges::find(shares, name, &ShareEntry::name);
+    if (found == shares.end()) {
         return Error(ErrorNumber::notFound, "There is no share \"" + plainText(name, 120) + "\".");
     }
     *out = std::make_unique<LoadedShare>(std::move(*found)).release();
@@ -57,11 +54,9 @@ Result<> tellPrivilege(const char* account, const VELT_SHARE* share, VELT_SHARE_
     if (account == nullptr || share == nullptr || out == nullptr) {
         return Error(ErrorNumber::invalid, "A privilege look-up needs an account and a share.");
     }
-    const auto access = accessOf(account, static_cast<const LoadedShare*>(share)->entry);
-    if (!access) {
-        return access.error();
-    }
-    *out = {{0, 0}, codeOf(*access)};
+    VELT_ASSIGN_OR_RETURN(const auto access,
+                          accessOf(account, static_cast<const LoadedShare*>(share)->entry));
+    *out = {{0, 0}, codeOf(access)};
     return {};
 }
 

@@ -10,14 +10,12 @@ thread_local PortConflict lastConflict;
 
 Result<> expectNoConflict(const char* service, int firstPort, int lastPort) {
     lastConflict = {};
-    auto found = findPortConflict(service == nullptr ? "" : service, firstPort, lastPort);
+    VELT_ASSIGN_OR_RETURN(auto found,
+                          findPortConflict(service == nullptr ? "" : service, firstPort, lastPort));
     if (!found) {
-        return found.error();
-    }
-    if (!*found) {
         return {};
     }
-    lastConflict = std::move(**found);
+    lastConflict = std::move(*found);
     return Error(ErrorNumber::portTaken, lastConflict.sentence);
 }
 

@@ -29,15 +29,11 @@ Result<> check(const SftpSettings& settings) {
 template<class Settings>
 Result<> changeStored(Result<Settings> (&load)(), const std::function<void(Settings&)>& change,
                       const std::function<Result<>(const Settings&)>& store) {
-    const auto lock = StateLock::take();
-    if (!lock)
-        return lock.error();
-    Result<Settings> settings = load();
-    if (!settings)
-        return settings.error();
-    change(*settings);
-    const Result<> checked = check(*settings);
-    return checked ? store(*settings) : checked;
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    VELT_ASSIGN_OR_RETURN(Settings settings, load());
+    change(settings);
+    VELT_RETURN_IF_ERROR(check(settings));
+    return store(settings);
 }
 
 Result<> storeExternalAddress(const FtpSettings& settings) {

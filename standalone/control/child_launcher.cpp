@@ -35,12 +35,9 @@ std::string joinPorts(const std::vector<int>& ports) {
 Result<> spawnDetached(const std::vector<std::string>& arguments, int report) {
     Spawn program;
     program.pass(report, reportDescriptor);
-    const auto pid = program.start(arguments);
-    if (!pid) {
-        return pid.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto pid, program.start(arguments));
     int status = 0;
-    while (::waitpid(*pid, &status, 0) < 0 && errno == EINTR) {
+    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
     }
     return {};
 }
@@ -63,18 +60,13 @@ std::optional<std::string> readReport(int descriptor) {
 } // namespace
 
 Result<> ChildLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
-    auto pipe = makePipe();
-    if (!pipe) {
-        return pipe.error();
-    }
+    VELT_ASSIGN_OR_RETURN(auto pipe, makePipe());
     std::vector<std::string> arguments{installedFile("velt-supervise").string(), folder.string(), daemon_,
                                        order.configurationHash, joinPorts(order.ports)};
     arguments.insert(arguments.end(), order.arguments.begin(), order.arguments.end());
-    if (auto spawned = spawnDetached(arguments, pipe->writeEnd.get()); !spawned) {
-        return spawned;
-    }
-    pipe->writeEnd.reset();
-    const auto report = readReport(pipe->readEnd.get());
+    VELT_RETURN_IF_ERROR(spawnDetached(arguments, pipe.writeEnd.get()));
+    pipe.writeEnd.reset();
+    const auto report = readReport(pipe.readEnd.get());
     constexpr std::string_view failure = "failed ";
     if (!report) {
         return Error("its supervisor did not report in time");

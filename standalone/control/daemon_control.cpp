@@ -21,18 +21,13 @@ namespace {
 /// One operation on a daemon at a time, over all threads and processes, as long as the descriptor is held.
 /// Not the lock of the settings: a start may take seconds, in which settings can be read and written.
 Result<UniqueFd> lockOperation(const Daemon& daemon) {
-    const auto folder = runFolder();
-    if (!folder) {
-        return folder.error();
-    }
-    const auto file = *folder / (std::string(daemon.name) + ".operation");
+    VELT_ASSIGN_OR_RETURN(const auto folder, runFolder());
+    const auto file = folder / (std::string(daemon.name) + ".operation");
     UniqueFd lock(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
     if (!lock) {
         return cannot("open", file);
     }
-    if (const auto locked = waitForFileLock(lock.get(), file); !locked) {
-        return locked.error();
-    }
+    VELT_RETURN_IF_ERROR(waitForFileLock(lock.get(), file));
     return lock;
 }
 
@@ -57,11 +52,9 @@ Result<bool> isWantedNext(const Daemon& daemon, const DaemonState& now) {
     if (!isServing(now)) {
         return true;
     }
-    if (const auto free = probePorts(listenerPorts(*settings), now.daemon.pid); !free) {
-        return free.error();
-    }
-    const auto tested = daemon.test();
-    return tested ? Result<bool>(true) : tested.error();
+    VELT_RETURN_IF_ERROR(probePorts(listenerPorts(*settings), now.daemon.pid));
+    VELT_RETURN_IF_ERROR(daemon.test());
+    return true;
 }
 
 /// After a start or a stop with this outcome: the rules open the ports of what is enabled, which may have
@@ -74,17 +67,14 @@ Result<> followedByFirewall(Result<> outcome) {
 }
 
 Result<> startPlanned(const Daemon& daemon) {
-    const auto plan = daemon.plan();
-    if (!plan) {
-        return plan.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto plan, daemon.plan());
     SupervisedDaemon supervised(daemon);
-    if (!*plan) {
+    if (!plan) {
         return supervised.stop();
     }
-    auto started = supervised.start((*plan)->order);
+    auto started = supervised.start(plan->order);
     if (started) {
-        removeFormerPlans(**plan);
+        removeFormerPlans(*plan);
     }
     return started;
 }
@@ -92,24 +82,18 @@ Result<> startPlanned(const Daemon& daemon) {
 } // namespace
 
 Result<> startDaemon(const Daemon& daemon) {
-    const auto lock = lockOperation(daemon);
-    return lock ? followedByFirewall(noteOutcome(daemon, startPlanned(daemon))) : lock.error();
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
+    return followedByFirewall(noteOutcome(daemon, startPlanned(daemon)));
 }
 
 Result<> stopDaemon(const Daemon& daemon) {
-    const auto lock = lockOperation(daemon);
-    if (!lock) {
-        return lock.error();
-    }
-    auto stopped = SupervisedDaemon(daemon).stop();
-    return stopped ? followedByFirewall(noteOutcome(daemon, stopped)) : stopped;
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
+    VELT_RETURN_IF_ERROR(SupervisedDaemon(daemon).stop());
+    return followedByFirewall(noteOutcome(daemon, {}));
 }
 
 Result<> stopDaemonForRestart(const Daemon& daemon) {
-    const auto lock = lockOperation(daemon);
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
     const auto wanted = isWantedNext(daemon, daemonState(daemon));
     if (!wanted) {
         return noteOutcome(daemon, wanted.error());
@@ -123,8 +107,8 @@ Result<> pauseDaemon(const Daemon& daemon) {
     if (!daemon.canPause) {
         return Error(ErrorNumber::invalid, titleOf(daemon) + " cannot be paused, only stopped.");
     }
-    const auto lock = lockOperation(daemon);
-    return lock ? SupervisedDaemon(daemon).pause() : lock.error();
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
+    return SupervisedDaemon(daemon).pause();
 }
 
 bool lostItsSupervisor(const DaemonState& state) {
@@ -133,20 +117,14 @@ bool lostItsSupervisor(const DaemonState& state) {
 }
 
 Result<> restoreDaemon(const Daemon& daemon) {
-    const auto lock = lockOperation(daemon);
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
     // Another process may have restored it while the lock was waited for.
     const DaemonState now = daemonState(daemon);
     if (isServing(now) && !lostItsSupervisor(now)) {
         return {};
     }
-    const auto settings = daemon.settings();
-    if (!settings) {
-        return settings.error();
-    }
-    const auto done = settings->enabled() ? startPlanned(daemon) : SupervisedDaemon(daemon).stop();
+    VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
+    const auto done = settings.enabled() ? startPlanned(daemon) : SupervisedDaemon(daemon).stop();
     return followedByFirewall(noteOutcome(daemon, done));
 }
 

@@ -48,11 +48,8 @@ PortConflict heldBy(int port, const std::string& holder) {
 Result<std::vector<Claim>> loadClaims() {
     std::vector<Claim> claims;
     for (const Daemon* daemon : allDaemons()) {
-        const auto settings = daemon->settings();
-        if (!settings) {
-            return settings.error();
-        }
-        for (const DaemonPorts& ports : settings->ports) {
+        VELT_ASSIGN_OR_RETURN(const auto settings, daemon->settings());
+        for (const DaemonPorts& ports : settings.ports) {
             claims.push_back({daemon, ports});
         }
     }
@@ -167,21 +164,15 @@ Result<std::optional<PortConflict>> findPortConflict(std::string_view service, i
     if (auto conflict = conflictOfForm(question)) {
         return conflict;
     }
-    const auto claims = loadClaims();
-    if (!claims) {
-        return claims.error();
-    }
-    const auto services = loadKnownServices();
-    if (!services) {
-        return services.error();
-    }
-    if (auto conflict = conflictWithConfiguration(question, *claims)) {
+    VELT_ASSIGN_OR_RETURN(const auto claims, loadClaims());
+    VELT_ASSIGN_OR_RETURN(const auto services, loadKnownServices());
+    if (auto conflict = conflictWithConfiguration(question, claims)) {
         return conflict;
     }
-    if (auto conflict = conflictWithKnownService(question, *claims, *services)) {
+    if (auto conflict = conflictWithKnownService(question, claims, services)) {
         return conflict;
     }
-    return conflictWithListener(question, *claims);
+    return conflictWithListener(question, claims);
 }
 
 } // namespace velt

@@ -11,12 +11,9 @@ namespace velt {
 Result<std::vector<VELT_FTP_PORT_RANGE>> enabledPorts() {
     std::vector<VELT_FTP_PORT_RANGE> open;
     for (const Daemon* daemon : allDaemons()) {
-        const auto settings = daemon->settings();
-        if (!settings) {
-            return settings.error();
-        }
-        if (settings->enabled()) {
-            for (const DaemonPorts& ports : settings->ports) {
+        VELT_ASSIGN_OR_RETURN(const auto settings, daemon->settings());
+        if (settings.enabled()) {
+            for (const DaemonPorts& ports : settings.ports) {
                 open.push_back(ports.range);
             }
         }

@@ -16,12 +16,9 @@ Result<> stop(const Daemon& daemon) {
 }
 
 Result<> followSettings(const Daemon& daemon) {
-    const auto settings = daemon.settings();
-    if (!settings) {
-        return settings.error();
-    }
-    return settings->enabled() ? perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); })
-                               : stop(daemon);
+    VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
+    return settings.enabled() ? perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); })
+                              : stop(daemon);
 }
 
 /// Does it with each daemon, whatever becomes of the others, and returns the first failure.

@@ -55,20 +55,15 @@ SupervisedDaemon::SupervisedDaemon(const Daemon& daemon, std::unique_ptr<Supervi
     : daemon_(daemon), name_(daemon.name), launcher_(std::move(launcher)) {}
 
 Result<> SupervisedDaemon::start(const DaemonOrder& order) {
-    const auto folder = runFolder();
-    if (!folder) {
-        return folder.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto folder, runFolder());
     const DaemonState now = daemonState(daemon_);
     const bool supervised = isAlive(now.supervisor);
     if (supervised && isServing(now) && now.configurationHash == order.configurationHash) {
         return {};
     }
-    if (auto free = probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0); !free) {
-        return free;
-    }
+    VELT_RETURN_IF_ERROR(probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0));
     const auto started =
-        supervised ? handOver(*folder, now.supervisor, order) : launcher_->launch(*folder, order);
+        supervised ? handOver(folder, now.supervisor, order) : launcher_->launch(folder, order);
     return started ? Result<>() : failure("does not start", started.error().message);
 }
 

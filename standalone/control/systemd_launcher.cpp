@@ -35,12 +35,8 @@ SystemdLauncher::SystemdLauncher(const Daemon& daemon, SystemdPlaces places)
     : daemon_(daemon), unit_(unitName(daemon)), places_(std::move(places)) {}
 
 Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
-    if (auto kept = keep(folder, order); !kept) {
-        return kept;
-    }
-    if (auto written = writeUnits(folder); !written) {
-        return written;
-    }
+    VELT_RETURN_IF_ERROR(keep(folder, order));
+    VELT_RETURN_IF_ERROR(writeUnits(folder));
     // Not "start": after a killed supervisor systemd may be waiting to start it again, and a daemon of the
     // former settings with it.
     const ProcessResult started = runProcess({places_.systemctl, "restart", unit_}, {}, startLimit);
@@ -68,9 +64,7 @@ Result<> SystemdLauncher::writeUnits(const std::filesystem::path& folder) const 
         if (readFile(file) == unit.text) {
             continue;
         }
-        if (auto replaced = replaceFile(file, unit.text, 0644); !replaced) {
-            return replaced;
-        }
+        VELT_RETURN_IF_ERROR(replaceFile(file, unit.text, 0644));
         written = true;
     }
     if (!written) {

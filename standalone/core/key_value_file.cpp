@@ -76,22 +76,17 @@ mode_t modeOf(const std::filesystem::path& file) {
 } // namespace
 
 Result<std::optional<std::string>> readKeyValue(const std::filesystem::path& file, std::string_view key) {
-    const auto contents = readOptionalFile(file);
+    VELT_ASSIGN_OR_RETURN(const auto contents, readOptionalFile(file));
     if (!contents)
-        return contents.error();
-    if (!*contents)
         return std::nullopt;
-    const auto found = findKey(**contents, key);
+    const auto found = findKey(*contents, key);
     return found ? std::optional(std::string(found->value)) : std::nullopt;
 }
 
 Result<> writeKeyValue(const std::filesystem::path& file, std::string_view key, std::string_view value) {
-    if (auto checked = checkKeyValue(key, value); !checked)
-        return checked;
-    const auto read = readOptionalFile(file);
-    if (!read)
-        return read.error();
-    std::string contents = read->value_or("");
+    VELT_RETURN_IF_ERROR(checkKeyValue(key, value));
+    VELT_ASSIGN_OR_RETURN(const auto read, readOptionalFile(file));
+    std::string contents = read.value_or("");
     const std::string line = std::string(key) + '=' + quotedIfNeeded(value);
     if (const auto found = findKey(contents, key)) {
         contents.replace(found->begin, found->length, line);

@@ -32,10 +32,7 @@ ScratchFolder::ScratchFolder(std::filesystem::path path, UniqueFd lock)
 
 Result<ScratchFolder> ScratchFolder::make() {
     // Keeps a sweep away until the folder has its lock.
-    const auto making = StateLock::take();
-    if (!making) {
-        return making.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto making, StateLock::take());
     const auto parent = statePath(paths::run);
     std::error_code error;
     std::filesystem::create_directories(parent, error);

@@ -35,8 +35,7 @@ Result<UniqueFd> openAndLock() {
     UniqueFd file(::open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
     if (!file)
         return cannot("lock", path);
-    if (auto locked = waitForFileLock(file.get(), path); !locked)
-        return locked.error();
+    VELT_RETURN_IF_ERROR(waitForFileLock(file.get(), path));
     return file;
 }
 
@@ -45,10 +44,7 @@ Result<UniqueFd> openAndLock() {
 Result<StateLock> StateLock::take() {
     ThreadLock& lock = threadLock();
     if (lock.depth == 0) {
-        auto file = openAndLock();
-        if (!file)
-            return file.error();
-        lock.file = std::move(*file);
+        VELT_ASSIGN_OR_RETURN(lock.file, openAndLock());
     }
     ++lock.depth;
     return StateLock();

@@ -28,10 +28,8 @@ std::string_view withoutComment(std::string_view line) {
 } // namespace
 
 Result<StrictFile> StrictFile::load(const std::filesystem::path& path, FileVersions versions) {
-    const auto contents = readOptionalFile(path);
-    if (!contents)
-        return contents.error();
-    return *contents ? parse(path.string(), **contents, versions) : StrictFile(path.string());
+    VELT_ASSIGN_OR_RETURN(const auto contents, readOptionalFile(path));
+    return contents ? parse(path.string(), *contents, versions) : StrictFile(path.string());
 }
 
 Result<StrictFile> StrictFile::parse(std::string name, std::string_view contents, FileVersions versions) {
@@ -43,8 +41,7 @@ Result<StrictFile> StrictFile::parse(std::string name, std::string_view contents
         at += line.size() + 1;
     }
     // A newer version tells more than a line whose form only that version knows.
-    if (Result<> read = file.readVersion(versions); !read)
-        return read.error();
+    VELT_RETURN_IF_ERROR(file.readVersion(versions));
     if (file.problem_)
         return *file.problem_;
     return file;

@@ -33,12 +33,9 @@ inline constexpr int optionalKey = INT_MAX;
 /// One file's keys. The functions that read a value give the default, too, when something is wrong; what that
 /// was is the result of finish(), the first problem of several:
 ///
-///     Result<StrictFile> file = StrictFile::load(path);
-///     if (!file)
-///         return file.error();
-///     settings.loopbackOnly = file->boolean("loopback_only", false);
-///     if (Result<> done = file->finish(); !done)
-///         return done.error();
+///     VELT_ASSIGN_OR_RETURN(StrictFile file, StrictFile::load(path));
+///     settings.loopbackOnly = file.boolean("loopback_only", false);
+///     VELT_RETURN_IF_ERROR(file.finish());
 ///
 /// Errors name the file and, where there is one, the line.
 class StrictFile {

@@ -84,9 +84,7 @@ Result<> replaceRules(const std::string& script) {
         return {};
     }
     // Noted before it is done, since a note without rules does no harm.
-    if (Result<> noted = noteLoading(); !noted) {
-        return noted;
-    }
+    VELT_RETURN_IF_ERROR(noteLoading());
     const auto before = rulesetGeneration();
     const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
     if (result.exitCode != 0) {
@@ -105,23 +103,14 @@ Result<> loadFirewallRules(const std::function<Result<std::vector<VELT_FTP_PORT_
     }
     // Held until the rules are loaded: of two processes the one with the older settings must not load its
     // rules last.
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
-    const auto firewall = loadFirewallSettings();
-    if (!firewall) {
-        return firewall.error();
-    }
-    const bool off = firewall->mode == FirewallMode::off;
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    VELT_ASSIGN_OR_RETURN(const auto firewall, loadFirewallSettings());
+    const bool off = firewall.mode == FirewallMode::off;
     if (off && !rulesWereLoaded()) {
         return {}; // nothing to take away, and perhaps no right to do it
     }
-    const auto ports = openPorts();
-    if (!ports) {
-        return ports.error();
-    }
-    const std::string script = renderRuleset(*firewall, *ports);
+    VELT_ASSIGN_OR_RETURN(const auto ports, openPorts());
+    const std::string script = renderRuleset(firewall, ports);
     return off ? removeRules(script) : replaceRules(script);
 }
 

@@ -50,16 +50,11 @@ std::vector<VELT_FTP_PORT_RANGE> readPorts(StrictFile& file) {
 } // namespace
 
 Result<FirewallSettings> loadFirewallSettings() {
-    Result<StrictFile> file = StrictFile::load(statePath(paths::firewallSettings));
-    if (!file) {
-        return file.error();
-    }
+    VELT_ASSIGN_OR_RETURN(StrictFile file, StrictFile::load(statePath(paths::firewallSettings)));
     FirewallSettings settings;
-    settings.mode = readMode(*file, settings.mode);
-    settings.furtherPorts = readPorts(*file);
-    if (Result<> done = file->finish(); !done) {
-        return done.error();
-    }
+    settings.mode = readMode(file, settings.mode);
+    settings.furtherPorts = readPorts(file);
+    VELT_RETURN_IF_ERROR(file.finish());
     return settings;
 }
 

@@ -41,11 +41,7 @@ Result<LogDatabase*> currentDatabase(Connection& open) {
     const std::filesystem::path path = statePath(paths::logDatabase);
     if (open.database == nullptr || !open.database->leadsTo(path)) {
         open.database.reset();
-        auto opened = LogDatabase::open(path);
-        if (!opened) {
-            return opened.error();
-        }
-        open.database = std::move(*opened);
+        VELT_ASSIGN_OR_RETURN(open.database, LogDatabase::open(path));
     }
     return open.database.get();
 }
@@ -79,8 +75,8 @@ Result<> store(LogEntry& entry) {
     const std::optional<LogRetention> retention = retentionIfReadable();
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);
-    const Result<LogDatabase*> database = currentDatabase(open);
-    return database ? (*database)->append(entry, retention) : database.error();
+    VELT_ASSIGN_OR_RETURN(LogDatabase* const database, currentDatabase(open));
+    return database->append(entry, retention);
 }
 
 } // namespace
@@ -102,8 +98,8 @@ Result<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
     }
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);
-    const Result<LogDatabase*> database = currentDatabase(open);
-    return database ? (*database)->query(filter) : database.error();
+    VELT_ASSIGN_OR_RETURN(LogDatabase* const database, currentDatabase(open));
+    return database->query(filter);
 }
 
 } // namespace velt

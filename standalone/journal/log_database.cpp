@@ -108,17 +108,13 @@ Error LogDatabase::cannotBe(const char* what) const {
 }
 
 Result<std::unique_ptr<LogDatabase>> LogDatabase::open(const std::filesystem::path& path) {
-    if (auto made = makeFile(path); !made) {
-        return made.error();
-    }
+    VELT_RETURN_IF_ERROR(makeFile(path));
     std::unique_ptr<LogDatabase> log(new LogDatabase(path));
     const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
     if (sqlite3_open_v2(path.c_str(), &log->database_, flags, nullptr) != SQLITE_OK) {
         return log->cannotBe("opened");
     }
-    if (auto prepared = log->prepare(); !prepared) {
-        return prepared.error();
-    }
+    VELT_RETURN_IF_ERROR(log->prepare());
     return log;
 }
 
@@ -130,8 +126,8 @@ Result<> LogDatabase::prepare() {
         execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
         return cannotBe("opened");
     }
-    auto made = makeTable();
-    return made ? prepareStatements() : made;
+    VELT_RETURN_IF_ERROR(makeTable());
+    return prepareStatements();
 }
 
 Result<> LogDatabase::makeTable() {

@@ -17,16 +17,11 @@ constexpr FileVersions versions{1, false};
 } // namespace
 
 Result<LogRetention> loadRetention() {
-    Result<StrictFile> file = StrictFile::load(statePath(paths::logRetention), versions);
-    if (!file) {
-        return file.error();
-    }
+    VELT_ASSIGN_OR_RETURN(StrictFile file, StrictFile::load(statePath(paths::logRetention), versions));
     LogRetention retention;
-    retention.maxEntries = file->number("max_entries", 0, mostEntries, retention.maxEntries, optionalKey);
-    retention.maxAgeDays = file->number("max_age_days", 0, mostDays, retention.maxAgeDays, optionalKey);
-    if (Result<> done = file->finish(); !done) {
-        return done.error();
-    }
+    retention.maxEntries = file.number("max_entries", 0, mostEntries, retention.maxEntries, optionalKey);
+    retention.maxAgeDays = file.number("max_age_days", 0, mostDays, retention.maxAgeDays, optionalKey);
+    VELT_RETURN_IF_ERROR(file.finish());
     return retention;
 }
 

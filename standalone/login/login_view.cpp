@@ -28,21 +28,15 @@ Result<std::vector<ShareEntry>> readShares() {
     if (std::filesystem::symlink_status(path, error).type() == std::filesystem::file_type::not_found) {
         return std::vector<ShareEntry>();
     }
-    const auto text = readTrusted(path);
-    return text ? parseShares(*text) : text.error();
+    VELT_ASSIGN_OR_RETURN(const auto text, readTrusted(path));
+    return parseShares(text);
 }
 
 /// The path of the rule that the user follows, if any.
 Result<std::optional<std::string>> readRule(const Identity& user) {
-    const auto text = readTrusted(statePath(paths::chrootRules));
-    if (!text) {
-        return text.error();
-    }
-    const auto rules = parseRules(*text);
-    if (!rules) {
-        return rules.error();
-    }
-    const ChrootRule* const rule = ruleFor(*rules, user.uid, user.gids);
+    VELT_ASSIGN_OR_RETURN(const auto text, readTrusted(statePath(paths::chrootRules)));
+    VELT_ASSIGN_OR_RETURN(const auto rules, parseRules(text));
+    const ChrootRule* const rule = ruleFor(rules, user.uid, user.gids);
     return rule != nullptr ? std::optional(rule->path) : std::nullopt;
 }
 
@@ -79,16 +73,13 @@ Result<> ViewMaker::showOne(OpenedFolder folder, const std::filesystem::path& ou
 }
 
 Result<> ViewMaker::showHome() {
-    auto home = openFolderAs(login_.user, login_.home);
-    if (!home) {
-        return home.error();
-    }
-    if (home->place == "/") {
+    VELT_ASSIGN_OR_RETURN(auto home, openFolderAs(login_.user, login_.home));
+    if (home.place == "/") {
         return refuse("The user's home is \"/\", the whole server.");
     }
     // Shares around the home do not count, since it is the user's own; a share that is the home does.
-    const auto outer = home->place.parent_path();
-    return showOne(std::move(*home), outer, Access::write);
+    const auto outer = home.place.parent_path();
+    return showOne(std::move(home), outer, Access::write);
 }
 
 Result<> ViewMaker::showInShare(const std::string& path) {
@@ -101,29 +92,23 @@ Result<> ViewMaker::showInShare(const std::string& path) {
     if (access == Access::none) {
         return refuse("The share " + share->name + " grants the user no access.");
     }
-    auto folder = openFolderAs(login_.user, share->path);
-    if (!folder) {
-        return folder.error();
-    }
-    const auto outer = folder->place;
+    VELT_ASSIGN_OR_RETURN(auto folder, openFolderAs(login_.user, share->path));
+    const auto outer = folder.place;
     if (end < path.size()) {
-        folder = openFolderBelow(login_.user, folder->fd, path.substr(end + 1));
+        VELT_ASSIGN_OR_RETURN(folder, openFolderBelow(login_.user, folder.fd, path.substr(end + 1)));
     }
-    return folder ? showOne(std::move(*folder), outer, access) : folder.error();
+    return showOne(std::move(folder), outer, access);
 }
 
 Result<> ViewMaker::addShare(SideBySide& view, const ShareEntry& share, Access access) {
-    auto folder = openFolderAs(login_.user, share.path);
-    return folder ? view.add(share.name, {std::move(folder->fd), access,
-                                          grants_.restrictionsBelow(folder->place, access)})
-                  : folder.error();
+    VELT_ASSIGN_OR_RETURN(auto folder, openFolderAs(login_.user, share.path));
+    return view.add(share.name,
+                    {std::move(folder.fd), access, grants_.restrictionsBelow(folder.place, access)});
 }
 
 Result<> ViewMaker::showShares() {
     SideBySide view(root_);
-    if (Result<> begun = view.begin(); !begun) {
-        return begun;
-    }
+    VELT_RETURN_IF_ERROR(view.begin());
     for (const ShareEntry& share : shares_) {
         const Access access = share.offeredToFtp ? grants_.on(share) : Access::none;
         if (access == Access::none) {
@@ -140,15 +125,12 @@ Result<> ViewMaker::showToAnonymous() {
     if (login_.anonymousShare.empty()) {
         return showShares();
     }
-    const auto name = readTrusted(login_.anonymousShare);
-    if (!name) {
-        return name.error();
-    }
-    const auto share = std::ranges::find(shares_, *name, &ShareEntry::name);
+    VELT_ASSIGN_OR_RETURN(const auto name, readTrusted(login_.anonymousShare));
+    const auto share = std::ranges::find(shares_, name, &ShareEntry::name);
     if (share == shares_.end() || !share->offeredToFtp) {
         return refuse("The share for anonymous users does not exist, or is not offered to FTP.");
     }
-    return showInShare("/" + *name);
+    return showInShare("/" + name);
 }
 
 Result<> show(ViewMaker& maker, DefaultView view, const std::optional<std::string>& rule) {
@@ -166,28 +148,17 @@ Result<> show(ViewMaker& maker, DefaultView view, const std::optional<std::strin
 Result<std::vector<std::string>> makeLoginView(const Login& login, const std::filesystem::path& root) {
     std::optional<std::string> rule;
     if (login.view != DefaultView::anonymous) {
-        auto read = readRule(login.user);
-        if (!read) {
-            return read.error();
-        }
-        rule = std::move(*read);
+        VELT_ASSIGN_OR_RETURN(rule, readRule(login.user));
     }
     if (login.view == DefaultView::server) {
         return rule ? Result<std::vector<std::string>>(
                           refuse("Without root's rights a login cannot be confined."))
                     : std::vector<std::string>();
     }
-    const auto shares = readShares();
-    if (!shares) {
-        return shares.error();
-    }
-    if (const Result<> isolated = isolateMounts(); !isolated) {
-        return isolated.error();
-    }
-    ViewMaker maker(login, root, *shares);
-    if (const Result<> shown = show(maker, login.view, rule); !shown) {
-        return shown.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto shares, readShares());
+    VELT_RETURN_IF_ERROR(isolateMounts());
+    ViewMaker maker(login, root, shares);
+    VELT_RETURN_IF_ERROR(show(maker, login.view, rule));
     return std::move(maker.remarks);
 }
 

@@ -65,15 +65,13 @@ Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& 
 /// Opens with the user's rights, and looks for the place without them again.
 template<class Open>
 Result<OpenedFolder> openAs(const Identity& user, const std::filesystem::path& path, Open&& open) {
-    Result<UniqueFd> folder = [&]() -> Result<UniqueFd> {
+    const auto openWithRights = [&]() -> Result<UniqueFd> {
         const FileRightsOf rights(user);
         return rights.taken() ? open() : cannot("open", path, EPERM);
-    }();
-    if (!folder) {
-        return folder.error();
-    }
-    const auto place = placeOf(*folder);
-    return place ? Result<OpenedFolder>(OpenedFolder{std::move(*folder), *place}) : place.error();
+    };
+    VELT_ASSIGN_OR_RETURN(UniqueFd folder, openWithRights());
+    VELT_ASSIGN_OR_RETURN(const auto place, placeOf(folder));
+    return OpenedFolder{std::move(folder), place};
 }
 
 } // namespace

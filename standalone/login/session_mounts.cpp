@@ -21,14 +21,11 @@ int tryMounts() {
 } // namespace
 
 Result<> checkSessionMounts() {
-    const auto error = askChild(tryMounts);
-    if (!error) {
-        return error.error();
-    }
-    if (*error != 0) {
+    VELT_ASSIGN_OR_RETURN(const auto error, askChild(tryMounts));
+    if (error != 0) {
         return Error(ErrorNumber::daemon,
                      std::string("FTP sessions cannot be confined here: cannot make a mount namespace: ") +
-                         std::strerror(*error) + ".");
+                         std::strerror(error) + ".");
     }
     return {};
 }

@@ -61,13 +61,10 @@ bool isWithin(const std::filesystem::path& place, const std::filesystem::path& o
 }
 
 Result<> coverOne(const UniqueFd& tree, const Restriction& restriction) {
-    const auto folder = openFolderExactly(tree, restriction.place);
-    if (!folder) {
-        return folder.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto folder, openFolderExactly(tree, restriction.place));
     const UniqueFd cover =
-        restriction.access == Access::none ? nothing() : mountOf(*folder, restriction.access);
-    return outcome(cover && attach(cover, *folder),
+        restriction.access == Access::none ? nothing() : mountOf(folder, restriction.access);
+    return outcome(cover && attach(cover, folder),
                    "Cannot restrict the folder " + restriction.place.string() + " of another share");
 }
 
@@ -78,9 +75,7 @@ Result<> restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& re
         if (std::ranges::any_of(hidden, [&](const auto& outer) { return isWithin(place, outer); })) {
             continue;
         }
-        if (Result<> done = coverOne(tree, restriction); !done) {
-            return done;
-        }
+        VELT_RETURN_IF_ERROR(coverOne(tree, restriction));
         if (restriction.access == Access::none) {
             hidden.push_back(place);
         }
@@ -90,12 +85,9 @@ Result<> restrictWithin(const UniqueFd& tree, const std::vector<Restriction>& re
 
 /// Mounts the folder at `place`, without its restrictions yet.
 Result<UniqueFd> mountAt(const std::filesystem::path& place, const VisibleFolder& visible) {
-    const auto where = openFolder(place);
-    if (!where) {
-        return where.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto where, openFolder(place));
     UniqueFd tree = mountOf(visible.folder, visible.access);
-    if (!tree || !attach(tree, *where)) {
+    if (!tree || !attach(tree, where)) {
         return failed("Cannot mount the folder");
     }
     return tree;
@@ -110,8 +102,8 @@ Result<> isolateMounts() {
 }
 
 Result<> showFolder(const std::filesystem::path& root, const VisibleFolder& visible) {
-    const auto tree = mountAt(root, visible);
-    return tree ? restrictWithin(*tree, visible.restrictions) : tree.error();
+    VELT_ASSIGN_OR_RETURN(const auto tree, mountAt(root, visible));
+    return restrictWithin(tree, visible.restrictions);
 }
 
 Result<> SideBySide::begin() {

@@ -35,12 +35,9 @@ Result<std::vector<KnownService>> parseKnownServices(std::string_view text, cons
 
 Result<std::vector<KnownService>> loadKnownServices() {
     const std::filesystem::path file = statePath(paths::knownServices);
-    const auto text = readOptionalFile(file);
-    if (!text) {
-        return text.error();
-    }
-    return *text ? parseKnownServices(**text, file.string())
-                 : parseKnownServices(shippedKnownServices, "known_services.conf, as shipped");
+    VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(file));
+    return text ? parseKnownServices(*text, file.string())
+                : parseKnownServices(shippedKnownServices, "known_services.conf, as shipped");
 }
 
 } // namespace velt

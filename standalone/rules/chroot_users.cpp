@@ -17,13 +17,10 @@ bool confinesToHome(const ChrootRule& rule) {
 }
 
 Result<Ids> chrootUserIds() {
-    const auto rules = loadRules();
-    if (!rules) {
-        return rules.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto rules, loadRules());
     Ids ids;
     Ids seen;
-    for (const ChrootRule& rule : *rules) {
+    for (const ChrootRule& rule : rules) {
         // A second rule of a user has no effect.
         if (rule.isUser && seen.insert(rule.id).second && confinesToHome(rule)) {
             ids.insert(rule.id);
@@ -64,11 +61,8 @@ std::vector<std::string> unlistedNames(Ids ids, const std::vector<UserEntry>& li
 Result<std::vector<uid_t>> idsOf(const std::vector<std::string>& names) {
     std::vector<uid_t> ids;
     for (const std::string& name : names) {
-        const auto user = findUser(name);
-        if (!user) {
-            return user.error();
-        }
-        ids.push_back(user->uid);
+        VELT_ASSIGN_OR_RETURN(const auto user, findUser(name));
+        ids.push_back(user.uid);
     }
     return ids;
 }
@@ -103,42 +97,27 @@ void deleteRules(Rules& rules, const std::vector<uid_t>& ids) {
 }
 
 Result<> change(const std::vector<std::string>& names, void (*apply)(Rules&, const std::vector<uid_t>&)) {
-    const auto ids = idsOf(names);
-    if (!ids) {
-        return ids.error();
-    }
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
-    auto rules = loadRules();
-    if (!rules) {
-        return rules.error();
-    }
-    const Rules before = *rules;
-    apply(*rules, *ids);
-    return *rules == before ? Result<>() : storeRules(*rules);
+    VELT_ASSIGN_OR_RETURN(const auto ids, idsOf(names));
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    VELT_ASSIGN_OR_RETURN(auto rules, loadRules());
+    const Rules before = rules;
+    apply(rules, ids);
+    return rules == before ? Result<>() : storeRules(rules);
 }
 
 } // namespace
 
 Result<std::vector<std::string>> chrootUsers(const UserFilter& filter) {
-    const auto ids = chrootUserIds();
-    if (!ids) {
-        return ids.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto ids, chrootUserIds());
     const auto users = allUsers();
-    auto names = listedNames(*users, filter, *ids, true);
-    std::ranges::move(unlistedNames(*ids, *users, filter), std::back_inserter(names));
+    auto names = listedNames(*users, filter, ids, true);
+    std::ranges::move(unlistedNames(ids, *users, filter), std::back_inserter(names));
     return names;
 }
 
 Result<std::vector<std::string>> otherUsers(const UserFilter& filter) {
-    const auto ids = chrootUserIds();
-    if (!ids) {
-        return ids.error();
-    }
-    return listedNames(*allUsers(), filter, *ids, false);
+    VELT_ASSIGN_OR_RETURN(const auto ids, chrootUserIds());
+    return listedNames(*allUsers(), filter, ids, false);
 }
 
 Result<> addChrootUsers(const std::vector<std::string>& names) {

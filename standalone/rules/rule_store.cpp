@@ -48,11 +48,8 @@ Result<std::vector<ChrootRule>> parseRules(std::string_view text) {
 }
 
 Result<std::vector<ChrootRule>> loadRules() {
-    const auto text = readOptionalFile(rulesFile());
-    if (!text) {
-        return text.error();
-    }
-    return *text ? parseRules(**text) : std::vector<ChrootRule>();
+    VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(rulesFile()));
+    return text ? parseRules(*text) : std::vector<ChrootRule>();
 }
 
 Result<> storeRules(const std::vector<ChrootRule>& rules) {
@@ -62,18 +59,12 @@ Result<> storeRules(const std::vector<ChrootRule>& rules) {
         text += formatRule(rule);
         text += '\n';
     }
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     return perform(Effect::store, "chroot rules", [&text] { return replaceFile(rulesFile(), text, 0600); });
 }
 
 Result<> makeRulesFile() {
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     // Only where there is nothing: an unreadable file, or a link to a disk that is not mounted, holds rules
     // that an empty set would replace.
     std::error_code error;

@@ -7,15 +7,10 @@
 namespace velt {
 
 Result<NetworkSettings> loadNetworkSettings() {
-    Result<StrictFile> file = StrictFile::load(statePath(paths::networkSettings));
-    if (!file) {
-        return file.error();
-    }
+    VELT_ASSIGN_OR_RETURN(StrictFile file, StrictFile::load(statePath(paths::networkSettings)));
     NetworkSettings settings;
-    settings.loopbackOnly = file->boolean("loopback_only", settings.loopbackOnly);
-    if (Result<> done = file->finish(); !done) {
-        return done.error();
-    }
+    settings.loopbackOnly = file.boolean("loopback_only", settings.loopbackOnly);
+    VELT_RETURN_IF_ERROR(file.finish());
     return settings;
 }
 

@@ -61,8 +61,7 @@ template<class Settings> Result<> checkValues(const SettingsFile<Settings>& form
         const auto check = [&](const auto& field) {
             return checkValue(form.services, *stored.setting, field(settings));
         };
-        if (Result<> checked = std::visit(check, stored.field); !checked)
-            return checked;
+        VELT_RETURN_IF_ERROR(std::visit(check, stored.field));
     }
     return {};
 }
@@ -93,10 +92,8 @@ Result<> checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
 } // namespace
 
 Result<> checkFtpSettings(const FtpSettings& settings) {
-    if (Result<> values = checkValues(ftpSettingsFile(), settings); !values)
-        return values;
-    if (Result<> range = checkPassiveRange(settings.record); !range)
-        return range;
+    VELT_RETURN_IF_ERROR(checkValues(ftpSettingsFile(), settings));
+    VELT_RETURN_IF_ERROR(checkPassiveRange(settings.record));
     if (!settings.externalAddress.empty() && !parseIPv4(settings.externalAddress))
         return refuse("The external address is " + quotedText(settings.externalAddress) +
                       "; expected an IPv4 address such as 192.0.2.1, or nothing.");

@@ -105,8 +105,7 @@ template<class Settings> Result<Settings> readSettings(const SettingsFile<Settin
     Settings settings;
     for (const auto& stored : form.settings)
         withField(stored, settings, [&](auto&& field) { readValue(file, *stored.setting, field); });
-    if (Result<> done = file.finish(); !done)
-        return done.error();
+    VELT_RETURN_IF_ERROR(file.finish());
     return settings;
 }
 

@@ -20,10 +20,8 @@ constexpr mode_t settingsMode = 0644;
 
 template<class Settings>
 Result<Settings> loadFile(std::string_view name, const SettingsFile<Settings>& form) {
-    Result<StrictFile> file = StrictFile::load(statePath(name), {form.version});
-    if (!file)
-        return file.error();
-    return readSettings(form, *file);
+    VELT_ASSIGN_OR_RETURN(StrictFile file, StrictFile::load(statePath(name), {form.version}));
+    return readSettings(form, file);
 }
 
 Result<> storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
@@ -42,15 +40,11 @@ Result<FtpSettings> loadFtpFile() {
 }
 
 Result<FtpSettings> loadFtpSettings() {
-    Result<FtpSettings> settings = loadFtpFile();
-    if (!settings)
-        return settings;
+    VELT_ASSIGN_OR_RETURN(FtpSettings settings, loadFtpFile());
     const auto file = statePath(paths::systemInformation);
-    const auto address = readKeyValue(file, externalAddressKey);
-    if (!address)
-        return address.error();
-    settings->externalAddress = address->value_or("");
-    if (!settings->externalAddress.empty() && !parseIPv4(settings->externalAddress))
+    VELT_ASSIGN_OR_RETURN(const auto address, readKeyValue(file, externalAddressKey));
+    settings.externalAddress = address.value_or("");
+    if (!settings.externalAddress.empty() && !parseIPv4(settings.externalAddress))
         return Error(ErrorNumber::damaged,
                      "Cannot read " + file.string() + ": ftp_ext_ip: expected an IPv4 address.");
     return settings;
@@ -69,12 +63,9 @@ Result<> storeSftpSettings(const SftpSettings& settings) {
 }
 
 Result<> writeMissingSettings() {
-    const auto lock = StateLock::take();
-    if (!lock)
-        return lock.error();
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     if (isMissing(paths::ftpSettings))
-        if (Result<> stored = storeFtpSettings(defaultFtpSettings()); !stored)
-            return stored;
+        VELT_RETURN_IF_ERROR(storeFtpSettings(defaultFtpSettings()));
     return isMissing(paths::sftpSettings) ? storeSftpSettings(defaultSftpSettings()) : Result<>();
 }
 

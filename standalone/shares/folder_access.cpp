@@ -48,14 +48,12 @@ Result<Access> folderAccess(const std::string& path, const Identity& who) {
     if (who.gids.empty()) {
         return cannotAsk(path, "the account has no group");
     }
-    const auto answer = askChild([&] { return askKernel(path.c_str(), who, changeIdentity); });
-    if (!answer) {
-        return answer.error();
-    }
-    if (*answer == cannotTell) {
+    VELT_ASSIGN_OR_RETURN(const int answer,
+                          askChild([&] { return askKernel(path.c_str(), who, changeIdentity); }));
+    if (answer == cannotTell) {
         return cannotAsk(path, "the account's rights cannot be taken on");
     }
-    return static_cast<Access>(*answer);
+    return static_cast<Access>(answer);
 }
 
 } // namespace velt

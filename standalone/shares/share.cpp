@@ -53,8 +53,8 @@ Result<> checkShare(const ShareEntry& share) {
         return wrong("path",
                      "expected an absolute path without \"..\", at most 4095 bytes of UTF-8 in one line");
     }
-    const Result<> users = checkAccounts(share.users, "users");
-    return users ? checkAccounts(share.groups, "groups") : users;
+    VELT_RETURN_IF_ERROR(checkAccounts(share.users, "users"));
+    return checkAccounts(share.groups, "groups");
 }
 
 } // namespace

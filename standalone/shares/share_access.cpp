@@ -38,11 +38,8 @@ Result<std::optional<Access>> limited(std::optional<Access> grant, const ShareEn
     if (!grant || *grant == Access::none) {
         return grant;
     }
-    const Result<Access> allowed = folderAccess(share.path, who);
-    if (!allowed) {
-        return allowed.error();
-    }
-    return std::optional(std::min(*grant, *allowed));
+    VELT_ASSIGN_OR_RETURN(const Access allowed, folderAccess(share.path, who));
+    return std::optional(std::min(*grant, allowed));
 }
 
 } // namespace

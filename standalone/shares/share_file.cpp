@@ -98,8 +98,8 @@ Result<ShareEntry> shareOf(const Json::Value& object, std::size_t number) {
     share.offeredToFtp = members.truth("ftp");
     share.users = members.grants("users");
     share.groups = members.grants("groups");
-    const Result<> read = members.result();
-    return read ? Result<ShareEntry>(std::move(share)) : read.error();
+    VELT_RETURN_IF_ERROR(members.result());
+    return share;
 }
 
 Result<> checkRoot(const Json::Value& root) {
@@ -135,16 +135,11 @@ Result<std::vector<ShareEntry>> parseShares(std::string_view text) {
     if (!root) {
         return damaged("invalid JSON: " + plainText(root.error().message, 300));
     }
-    if (const Result<> good = checkRoot(*root); !good) {
-        return good.error();
-    }
+    VELT_RETURN_IF_ERROR(checkRoot(*root));
     std::vector<ShareEntry> shares;
     for (const Json::Value& object : (*root)["shares"]) {
-        auto share = shareOf(object, shares.size() + 1);
-        if (!share) {
-            return share.error();
-        }
-        shares.push_back(std::move(*share));
+        VELT_ASSIGN_OR_RETURN(auto share, shareOf(object, shares.size() + 1));
+        shares.push_back(std::move(share));
     }
     if (const Result<> good = checkShares(shares); !good) {
         return damaged(good.error().message);

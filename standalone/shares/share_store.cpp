@@ -29,11 +29,8 @@ Cache& cache() {
 }
 
 Result<std::vector<ShareEntry>> readShares(const std::filesystem::path& path) {
-    const auto text = readOptionalFile(path);
-    if (!text) {
-        return text.error();
-    }
-    return *text ? parseShares(**text) : std::vector<ShareEntry>();
+    VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(path));
+    return text ? parseShares(*text) : std::vector<ShareEntry>();
 }
 
 } // namespace
@@ -59,10 +56,7 @@ Result<> storeShares(const std::vector<ShareEntry>& shares) {
     if (const Result<> good = checkShares(shares); !good) {
         return Error(ErrorNumber::invalid, "Cannot store the shares: " + good.error().message + ".");
     }
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     return perform(Effect::store, "shares",
                    [&shares] { return replaceFile(statePath(paths::shares), renderShares(shares), 0644); });
 }

@@ -48,8 +48,8 @@ Result<> DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadli
     readOutput(); // what a former daemon left says nothing about this one
     lastLines_.clear();
     partialLine_.clear();
-    const Result<> spawned = spawn(order);
-    return spawned ? waitUntilListening(order, deadline) : spawned;
+    VELT_RETURN_IF_ERROR(spawn(order));
+    return waitUntilListening(order, deadline);
 }
 
 Result<> DaemonProcess::spawn(const DaemonOrder& order) {
@@ -60,12 +60,9 @@ Result<> DaemonProcess::spawn(const DaemonOrder& order) {
     program.open("/dev/null", O_RDONLY, STDIN_FILENO);
     program.pass(output_.writeEnd.get(), STDOUT_FILENO);
     program.pass(output_.writeEnd.get(), STDERR_FILENO);
-    const auto pid = program.start(order.arguments);
-    if (!pid) {
-        return pid.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto pid, program.start(order.arguments));
     // A child that has ended already cannot be identified any more, but keeps its pid until it is reaped.
-    id_ = identifyProcess(*pid).value_or(ProcessId{*pid, 0});
+    id_ = identifyProcess(pid).value_or(ProcessId{pid, 0});
     return {};
 }
 

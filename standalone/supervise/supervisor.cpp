@@ -62,9 +62,7 @@ Supervisor::Supervisor(std::filesystem::path folder, std::string name)
 
 Result<> Supervisor::begin(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;
-    if (auto locked = takeLock(); !locked) {
-        return locked;
-    }
+    VELT_RETURN_IF_ERROR(takeLock());
     ::prctl(PR_SET_CHILD_SUBREAPER, 1);
     signals_ = openSignals();
     if (!signals_) {
@@ -74,11 +72,8 @@ Result<> Supervisor::begin(const DaemonOrder& order) {
     if (former && !endLeftovers(*former)) {
         return Error("the former daemon, process " + std::to_string(former->daemon.pid) + ", does not end");
     }
-    auto control = ControlListener::open(folder_, name_);
-    if (!control) {
-        return control.error();
-    }
-    control_.emplace(std::move(*control));
+    VELT_ASSIGN_OR_RETURN(auto control, ControlListener::open(folder_, name_));
+    control_.emplace(std::move(control));
     order_ = order;
     auto started = startDaemon(deadline);
     if (!started) {
@@ -149,9 +144,7 @@ Result<> Supervisor::replaceDaemon(const DaemonOrder& order) {
     if (unchanged) {
         return {};
     }
-    if (auto ended = endDaemon(); !ended) {
-        return ended;
-    }
+    VELT_RETURN_IF_ERROR(endDaemon());
     order_ = order;
     backOff_ = shortestBackOff;
     // A failed start is not tried again: the caller hears of it and decides.

@@ -15,11 +15,8 @@ constexpr std::array serviceNames{
 };
 
 Result<DaemonSettings> readSettings() {
-    const auto stored = loadFtpSettings();
-    if (!stored) {
-        return stored.error();
-    }
-    const auto& record = stored->record;
+    VELT_ASSIGN_OR_RETURN(const auto stored, loadFtpSettings());
+    const auto& record = stored.record;
     const int control = controlPort(record);
     const auto passive = passiveRange(record);
     return DaemonSettings{
@@ -30,8 +27,8 @@ Result<DaemonSettings> readSettings() {
 }
 
 Result<> testStored() {
-    const auto stored = loadFtpSettings();
-    return stored ? testFtpCandidate(*stored) : stored.error();
+    VELT_ASSIGN_OR_RETURN(const auto stored, loadFtpSettings());
+    return testFtpCandidate(stored);
 }
 
 } // namespace

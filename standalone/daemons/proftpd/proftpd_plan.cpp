@@ -17,15 +17,10 @@ constexpr const char* program = "/usr/sbin/proftpd";
 
 // The same text, but for the files that the daemon would write: its test writes some of them, too.
 Result<> testRendering(const FtpSettings& settings, ProftpdPlaces places) {
-    const auto scratch = ScratchFolder::make();
-    if (!scratch) {
-        return scratch.error();
-    }
-    places.runFolder = scratch->path();
-    const auto configuration = scratch->path() / "proftpd.conf";
-    if (auto written = replaceFile(configuration, renderProftpd(settings, places), 0600); !written) {
-        return written;
-    }
+    VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
+    places.runFolder = scratch.path();
+    const auto configuration = scratch.path() / "proftpd.conf";
+    VELT_RETURN_IF_ERROR(replaceFile(configuration, renderProftpd(settings, places), 0600));
     return runConfigurationTest("FTP", {program, "-t", "-c", configuration.string()});
 }
 
@@ -59,13 +54,9 @@ std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
 
 Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
     for (const auto& folder : {places.runFolder, places.loginRoot, places.anonymousShare.parent_path()}) {
-        if (auto made = makeFolder(folder); !made) {
-            return made;
-        }
+        VELT_RETURN_IF_ERROR(makeFolder(folder));
     }
-    if (auto rules = makeRulesFile(); !rules) {
-        return rules;
-    }
+    VELT_RETURN_IF_ERROR(makeRulesFile());
     return confinesAnonymous(settings)
                ? replaceFile(places.anonymousShare, settings.record.anonymous_chroot_share, 0600)
                : Result<>();
@@ -75,14 +66,9 @@ Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found)
     const std::string hash = hashOf(settings, found);
     const auto folder = found.places.runFolder / "configurations" / hash;
     found.places.anonymousShare = folder / "anonymous";
-    if (const auto written = writeSurroundings(settings, found.places); !written) {
-        return written.error();
-    }
+    VELT_RETURN_IF_ERROR(writeSurroundings(settings, found.places));
     const auto configuration = folder / "proftpd.conf";
-    if (const auto written = replaceFile(configuration, renderProftpd(settings, found.places), 0600);
-        !written) {
-        return written.error();
-    }
+    VELT_RETURN_IF_ERROR(replaceFile(configuration, renderProftpd(settings, found.places), 0600));
     // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
     return DaemonPlan{{hash, {controlPort(settings.record)}, {program, "-n", "-c", configuration.string()}},
                       folder};
@@ -91,41 +77,23 @@ Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found)
 } // namespace
 
 Result<> testFtpCandidate(const FtpSettings& settings) {
-    const auto found = surveyFtp(settings);
-    return found ? testRendering(settings, found->places) : found.error();
+    VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
+    return testRendering(settings, found.places);
 }
 
 Result<std::optional<DaemonPlan>> planFtpDaemon() {
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
-    const auto settings = loadFtpSettings();
-    if (!settings) {
-        return settings.error();
-    }
-    if (!enablesFtp(settings->record)) {
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    VELT_ASSIGN_OR_RETURN(const auto settings, loadFtpSettings());
+    if (!enablesFtp(settings.record)) {
         return std::nullopt;
     }
-    if (const auto checked = checkFtpSettings(*settings); !checked) {
-        return checked.error();
-    }
-    const auto found = surveyFtp(*settings);
-    if (!found) {
-        return found.error();
-    }
-    if (const auto tested = testRendering(*settings, found->places); !tested) {
-        return tested.error();
-    }
+    VELT_RETURN_IF_ERROR(checkFtpSettings(settings));
+    VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
+    VELT_RETURN_IF_ERROR(testRendering(settings, found.places));
     // Else the daemon would start well, and refuse every login.
-    if (const auto mounts = found->places.accountFiles ? Result<>() : checkSessionMounts(); !mounts) {
-        return mounts.error();
-    }
-    auto plan = writePlan(*settings, *found);
-    if (!plan) {
-        return plan.error();
-    }
-    return std::move(*plan);
+    VELT_RETURN_IF_ERROR(found.places.accountFiles ? Result<>() : checkSessionMounts());
+    VELT_ASSIGN_OR_RETURN(auto plan, writePlan(settings, found));
+    return plan;
 }
 
 } // namespace velt

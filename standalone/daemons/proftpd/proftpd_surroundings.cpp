@@ -53,15 +53,12 @@ Result<> checkShares(const FtpSettings& settings) {
 }
 
 Result<> surveyCertificate(FtpSurroundings& found) {
-    const auto certificate = serverCertificate();
-    if (!certificate) {
-        return certificate.error();
-    }
-    found.places.certificate = certificate->certificate;
-    found.places.certificateKey = certificate->key;
-    found.places.certificateIsRsa = certificate->isRsa;
-    found.certificateFingerprint = certificate->fingerprint;
-    found.throwAway = certificate->throwAway;
+    VELT_ASSIGN_OR_RETURN(const auto certificate, serverCertificate());
+    found.places.certificate = certificate.certificate;
+    found.places.certificateKey = certificate.key;
+    found.places.certificateIsRsa = certificate.isRsa;
+    found.certificateFingerprint = certificate.fingerprint;
+    found.throwAway = certificate.throwAway;
     return {};
 }
 
@@ -101,35 +98,21 @@ Result<ProftpdPlaces> ownPlaces() {
                      "The folder " + places.stateRoot.string() + " or " + places.moduleFolder.string() +
                          " has a name that the FTP daemon's configuration cannot hold.");
     }
-    const auto network = loadNetworkSettings();
-    if (!network) {
-        return network.error();
-    }
-    places.loopbackOnly = network->loopbackOnly;
+    VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
+    places.loopbackOnly = network.loopbackOnly;
     return places;
 }
 
 } // namespace
 
 Result<FtpSurroundings> surveyFtp(const FtpSettings& settings) {
-    auto places = ownPlaces();
-    if (!places) {
-        return places.error();
-    }
-    FtpSurroundings found{std::move(*places), "", nullptr};
+    VELT_ASSIGN_OR_RETURN(auto places, ownPlaces());
+    FtpSurroundings found{std::move(places), "", nullptr};
     const bool tls = (settings.record.service_flags & VELT_FTP_SERVICE_TLS) != 0;
-    if (const auto rights = surveyRights(found.places); !rights) {
-        return rights.error();
-    }
-    if (const auto account = checkAnonymousAccount(settings); !account) {
-        return account.error();
-    }
-    if (const auto shares = checkShares(settings); !shares) {
-        return shares.error();
-    }
-    if (const auto certificate = tls ? surveyCertificate(found) : Result<>(); !certificate) {
-        return certificate.error();
-    }
+    VELT_RETURN_IF_ERROR(surveyRights(found.places));
+    VELT_RETURN_IF_ERROR(checkAnonymousAccount(settings));
+    VELT_RETURN_IF_ERROR(checkShares(settings));
+    VELT_RETURN_IF_ERROR(tls ? surveyCertificate(found) : Result<>());
     return found;
 }
 

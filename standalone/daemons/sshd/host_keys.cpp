@@ -22,18 +22,15 @@ namespace {
 constexpr std::array<std::string_view, 2> kinds{"ed25519", "rsa"};
 
 Result<> storeCopy(const std::filesystem::path& from, const std::filesystem::path& to, mode_t mode) {
-    const auto text = readFile(from);
-    return text ? replaceFile(to, *text, mode) : text.error();
+    VELT_ASSIGN_OR_RETURN(const auto text, readFile(from));
+    return replaceFile(to, text, mode);
 }
 
 // ssh-keygen writes in place, so the key is made aside and stored whole; the public half comes first, so
 // that a private key is never there without it.
 Result<> makeKey(const std::string& kind, const std::filesystem::path& place) {
-    const auto scratch = ScratchFolder::make();
-    if (!scratch) {
-        return scratch.error();
-    }
-    const auto made = scratch->path() / "key";
+    VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
+    const auto made = scratch.path() / "key";
     const auto result =
         runProcess({"/usr/bin/ssh-keygen", "-q", "-t", kind, "-N", "", "-C", "", "-f", made.string()}, {},
                    std::chrono::seconds(60));
@@ -41,8 +38,8 @@ Result<> makeKey(const std::string& kind, const std::filesystem::path& place) {
         return Error(ErrorNumber::daemon,
                      "Cannot make a host key for SFTP: " + lastWords(result.errors) + ".");
     }
-    const auto stored = storeCopy(made.string() + ".pub", place.string() + ".pub", 0644);
-    return stored ? storeCopy(made, place, 0600) : stored;
+    VELT_RETURN_IF_ERROR(storeCopy(made.string() + ".pub", place.string() + ".pub", 0644));
+    return storeCopy(made, place, 0600);
 }
 
 std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {
@@ -64,39 +61,28 @@ Result<> makeMissing(const std::vector<std::filesystem::path>& keys) {
         if (isThere(keys[i])) {
             continue;
         }
-        if (auto made = makeKey(std::string(kinds[i]), keys[i]); !made) {
-            return made;
-        }
+        VELT_RETURN_IF_ERROR(makeKey(std::string(kinds[i]), keys[i]));
     }
     return {};
 }
 
 // A configuration under test names keys also where none may be stored.
 Result<HostKeys> throwAwayKeys() {
-    auto folder = ScratchFolder::make();
-    if (!folder) {
-        return folder.error();
-    }
-    HostKeys keys{keysIn(folder->path()), std::make_shared<ScratchFolder>(std::move(*folder))};
-    const auto made = makeMissing(keys.files);
-    return made ? Result<HostKeys>(std::move(keys)) : made.error();
+    VELT_ASSIGN_OR_RETURN(auto folder, ScratchFolder::make());
+    HostKeys keys{keysIn(folder.path()), std::make_shared<ScratchFolder>(std::move(folder))};
+    VELT_RETURN_IF_ERROR(makeMissing(keys.files));
+    return keys;
 }
 
 } // namespace
 
 Result<HostKeys> hostKeys() {
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     HostKeys keys{keysIn(statePath(paths::hostKeys)), nullptr};
     if (std::ranges::all_of(keys.files, isThere)) {
         return keys;
     }
-    const auto stored = perform(Effect::store, "host keys", [&] { return makeMissing(keys.files); });
-    if (!stored) {
-        return stored.error();
-    }
+    VELT_RETURN_IF_ERROR(perform(Effect::store, "host keys", [&] { return makeMissing(keys.files); }));
     return std::ranges::all_of(keys.files, isThere) ? Result<HostKeys>(std::move(keys)) : throwAwayKeys();
 }
 

@@ -15,17 +15,14 @@ constexpr std::array dropIns{
 };
 
 Result<DaemonSettings> readSettings() {
-    const auto stored = loadSftpSettings();
-    if (!stored) {
-        return stored.error();
-    }
-    return DaemonSettings{{{"sftp", stored->enabled}},
-                          {{{stored->port, stored->port}, false, "the SFTP service"}}};
+    VELT_ASSIGN_OR_RETURN(const auto stored, loadSftpSettings());
+    return DaemonSettings{{{"sftp", stored.enabled}},
+                          {{{stored.port, stored.port}, false, "the SFTP service"}}};
 }
 
 Result<> testStored() {
-    const auto stored = loadSftpSettings();
-    return stored ? testSftpCandidate(*stored) : stored.error();
+    VELT_ASSIGN_OR_RETURN(const auto stored, loadSftpSettings());
+    return testSftpCandidate(stored);
 }
 
 } // namespace

@@ -40,71 +40,43 @@ struct Rendering {
 };
 
 Result<Rendering> render(const SftpSettings& settings) {
-    if (const auto made = makeSeparationFolder(); !made) {
-        return made.error();
-    }
-    auto keys = hostKeys();
-    if (!keys) {
-        return keys.error();
-    }
-    if (!isRenderable(keys->files.front())) {
+    VELT_RETURN_IF_ERROR(makeSeparationFolder());
+    VELT_ASSIGN_OR_RETURN(auto keys, hostKeys());
+    if (!isRenderable(keys.files.front())) {
         return Error(ErrorNumber::invalid,
                      "The folder " + statePath("/").string() +
                          " has a name that the SFTP daemon's configuration cannot hold.");
     }
-    const auto network = loadNetworkSettings();
-    if (!network) {
-        return network.error();
-    }
-    std::string text = renderSshd(settings, {keys->files, geteuid() == 0, network->loopbackOnly});
-    return Rendering{std::move(text), std::move(*keys)};
+    VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
+    std::string text = renderSshd(settings, {keys.files, geteuid() == 0, network.loopbackOnly});
+    return Rendering{std::move(text), std::move(keys)};
 }
 
 Result<> testRendering(const std::string& text) {
-    const auto scratch = ScratchFolder::make();
-    if (!scratch) {
-        return scratch.error();
-    }
-    const auto configuration = scratch->path() / "sshd_config";
-    if (auto written = replaceFile(configuration, text, 0600); !written) {
-        return written;
-    }
+    VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
+    const auto configuration = scratch.path() / "sshd_config";
+    VELT_RETURN_IF_ERROR(replaceFile(configuration, text, 0600));
     return runConfigurationTest("SFTP", {program, "-t", "-f", configuration.string()});
 }
 
 } // namespace
 
 Result<> testSftpCandidate(const SftpSettings& settings) {
-    const auto rendering = render(settings);
-    return rendering ? testRendering(rendering->text) : rendering.error();
+    VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
+    return testRendering(rendering.text);
 }
 
 Result<std::optional<DaemonPlan>> planSftpDaemon() {
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
-    const auto settings = loadSftpSettings();
-    if (!settings) {
-        return settings.error();
-    }
-    if (const auto checked = checkSftpSettings(*settings); !checked) {
-        return checked.error();
-    }
-    const auto rendering = render(*settings);
-    if (!rendering) {
-        return rendering.error();
-    }
-    if (const auto tested = testRendering(rendering->text); !tested) {
-        return tested.error();
-    }
-    const std::string hash = sha256(rendering->text);
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    VELT_ASSIGN_OR_RETURN(const auto settings, loadSftpSettings());
+    VELT_RETURN_IF_ERROR(checkSftpSettings(settings));
+    VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
+    VELT_RETURN_IF_ERROR(testRendering(rendering.text));
+    const std::string hash = sha256(rendering.text);
     const auto folder = statePath(paths::sftpConfigurations) / hash;
     const auto configuration = folder / "sshd_config";
-    if (const auto written = replaceFile(configuration, rendering->text, 0600); !written) {
-        return written.error();
-    }
-    return DaemonPlan{{hash, {settings->port}, {program, "-D", "-e", "-f", configuration.string()}}, folder};
+    VELT_RETURN_IF_ERROR(replaceFile(configuration, rendering.text, 0600));
+    return DaemonPlan{{hash, {settings.port}, {program, "-D", "-e", "-f", configuration.string()}}, folder};
 }
 
 } // namespace velt

@@ -88,25 +88,17 @@ bool isUsable(const Pair& pair) {
 }
 
 Result<> makeOwn(const Pair& pair) {
-    const auto made = makeSelfSigned(namesOfThisHost());
-    if (!made) {
-        return made.error();
-    }
-    const auto key = replaceFile(pair.key, made->key, 0600);
-    return key ? replaceFile(pair.certificate, made->certificate, 0644) : key;
+    VELT_ASSIGN_OR_RETURN(const auto made, makeSelfSigned(namesOfThisHost()));
+    VELT_RETURN_IF_ERROR(replaceFile(pair.key, made.key, 0600));
+    return replaceFile(pair.certificate, made.certificate, 0644);
 }
 
 // A configuration under test names a certificate also where none may be stored.
 Result<ServerCertificate> throwAway() {
-    auto made = ScratchFolder::make();
-    if (!made) {
-        return made.error();
-    }
-    const auto folder = std::make_shared<ScratchFolder>(std::move(*made));
+    VELT_ASSIGN_OR_RETURN(auto made, ScratchFolder::make());
+    const auto folder = std::make_shared<ScratchFolder>(std::move(made));
     const Pair pair{folder->path() / "server.crt", folder->path() / "server.key"};
-    if (const auto own = makeOwn(pair); !own) {
-        return own.error();
-    }
+    VELT_RETURN_IF_ERROR(makeOwn(pair));
     auto certificate = load(pair);
     if (certificate) {
         certificate->throwAway = folder;
@@ -127,16 +119,11 @@ Result<ServerCertificate> serverCertificate() {
         return load(given);
     }
     const Pair own{statePath(paths::ownCertificate), statePath(paths::ownKey)};
-    const auto lock = StateLock::take();
-    if (!lock) {
-        return lock.error();
-    }
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     if (isUsable(own)) {
         return load(own);
     }
-    if (const auto made = perform(Effect::store, "certificate", [&] { return makeOwn(own); }); !made) {
-        return made.error();
-    }
+    VELT_RETURN_IF_ERROR(perform(Effect::store, "certificate", [&] { return makeOwn(own); }));
     return isUsable(own) ? load(own) : throwAway();
 }
 
