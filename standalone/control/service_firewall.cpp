@@ -2,7 +2,7 @@
 
 #include "standalone/core/effects.h"
 #include "standalone/daemons/daemon.h"
-#include "standalone/firewall/firewall.h"
+#include "standalone/firewall/firewall_table.h"
 
 #include <syslog.h>
 

@@ -3,7 +3,7 @@
 #define VELT_STANDALONE_LOGIN_GRANTS_H
 
 #include "standalone/login/view_mounts.h"
-#include "standalone/shares/share.h"
+#include "standalone/shares/share_entry.h"
 
 #include <vector>
 

@@ -4,7 +4,7 @@
 
 #include "base/result.h"
 #include "standalone/shares/access.h"
-#include "standalone/shares/share.h"
+#include "standalone/shares/share_entry.h"
 
 #include <optional>
 #include <string>

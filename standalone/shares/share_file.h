@@ -2,7 +2,7 @@
 #ifndef VELT_STANDALONE_SHARES_SHARE_FILE_H
 #define VELT_STANDALONE_SHARES_SHARE_FILE_H
 
-#include "standalone/shares/share.h"
+#include "standalone/shares/share_entry.h"
 
 #include <string>
 #include <string_view>

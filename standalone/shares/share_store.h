@@ -2,7 +2,7 @@
 #ifndef VELT_STANDALONE_SHARES_SHARE_STORE_H
 #define VELT_STANDALONE_SHARES_SHARE_STORE_H
 
-#include "standalone/shares/share.h"
+#include "standalone/shares/share_entry.h"
 
 #include <vector>
 

@@ -1,6 +1,6 @@
 // Our table in the machine's packet filter.
-#ifndef VELT_STANDALONE_FIREWALL_FIREWALL_H
-#define VELT_STANDALONE_FIREWALL_FIREWALL_H
+#ifndef VELT_STANDALONE_FIREWALL_FIREWALL_TABLE_H
+#define VELT_STANDALONE_FIREWALL_FIREWALL_TABLE_H
 
 #include "base/result.h"
 #include "ftp/ftp_library.h"

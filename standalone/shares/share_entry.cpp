@@ -1,4 +1,4 @@
-#include "standalone/shares/share.h"
+#include "standalone/shares/share_entry.h"
 
 #include "base/plain_text.h"
 #include "standalone/core/error_number.h"

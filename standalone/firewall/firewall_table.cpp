@@ -1,4 +1,4 @@
-#include "standalone/firewall/firewall.h"
+#include "standalone/firewall/firewall_table.h"
 
 #include "base/file.h"
 #include "base/text.h"

@@ -1,6 +1,6 @@
 // A share, and what one may be.
-#ifndef VELT_STANDALONE_SHARES_SHARE_H
-#define VELT_STANDALONE_SHARES_SHARE_H
+#ifndef VELT_STANDALONE_SHARES_SHARE_ENTRY_H
+#define VELT_STANDALONE_SHARES_SHARE_ENTRY_H
 
 #include "base/result.h"
 #include "standalone/shares/access.h"
