@@ -1,8 +1,6 @@
-// Why a command failed.
+// Why a command failed, and how veltctl reports that to the program that started it.
 #ifndef VELT_CLI_FAILURE_H
 #define VELT_CLI_FAILURE_H
-
-#include "cli/exit_code.h"
 
 #include <iosfwd>
 #include <stdexcept>
@@ -10,6 +8,17 @@
 #include <vector>
 
 namespace velt::cli {
+
+/// The exit status.
+enum class ExitCode {
+    done = 0,
+    local = 1,    ///< a file or the output could not be read or written here
+    usage = 2,    ///< the command line is wrong; nothing was asked of the server
+    refused = 3,  ///< the input was refused
+    conflict = 4, ///< the input conflicts with something else: a port, a share
+    platform = 5, ///< the server failed to carry it out
+    access = 6,   ///< the server cannot be reached, or does not allow this user or token to do it
+};
 
 class Failure : public std::runtime_error {
 public:

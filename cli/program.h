@@ -4,7 +4,7 @@
 
 #include "cli/command.h"
 #include "cli/console.h"
-#include "cli/exit_code.h"
+#include "cli/failure.h"
 
 #include <string>
 #include <vector>

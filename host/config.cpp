@@ -59,34 +59,27 @@ const std::string& notEmpty(const std::string& text) {
     return text;
 }
 
-Setting limit(std::size_t HttpLimits::*member, Range range) {
-    return {Form::number,
-            [=](Config& config, const std::string& value) { config.limits.*member = number(value, range); }};
+/// Where a setting is kept, by the members that lead there.
+template<class... Members> auto& placeOf(Config& config, Members... members) {
+    return (config.*....*members);
 }
 
-Setting seconds(std::chrono::milliseconds HttpLimits::*member) {
+template<class... Members> Setting count(Range range, Members... members) {
     return {Form::number, [=](Config& config, const std::string& value) {
-                config.limits.*member = std::chrono::seconds(number(value, someSeconds));
+                auto& place = placeOf(config, members...);
+                place = static_cast<std::remove_reference_t<decltype(place)>>(number(value, range));
             }};
 }
 
-Setting threads(unsigned Config::*member, Range range) {
+template<class... Members> Setting seconds(Range range, Members... members) {
     return {Form::number, [=](Config& config, const std::string& value) {
-                config.*member = static_cast<unsigned>(number(value, range));
+                placeOf(config, members...) = std::chrono::seconds(number(value, range));
             }};
 }
 
-Setting flag(bool Config::*member) {
-    return {Form::flag, [=](Config& config, const std::string&) { config.*member = true; }};
-}
-
-template<class Member> Setting text(Member Config::*member) {
-    return {Form::text, [=](Config& config, const std::string& value) { config.*member = notEmpty(value); }};
-}
-
-Setting tlsFile(std::filesystem::path TlsFiles::*member) {
+template<class... Members> Setting text(Members... members) {
     return {Form::text,
-            [=](Config& config, const std::string& value) { config.tls.*member = notEmpty(value); }};
+            [=](Config& config, const std::string& value) { placeOf(config, members...) = notEmpty(value); }};
 }
 
 template<class List> Setting list(List Config::*member) {
@@ -95,32 +88,32 @@ template<class List> Setting list(List Config::*member) {
             }};
 }
 
+Setting flag(bool Config::*member) {
+    return {Form::flag, [=](Config& config, const std::string&) { config.*member = true; }};
+}
+
 std::map<std::string, Setting> allSettings() {
     return {
         {"admin-group", text(&Config::adminGroup)},
         {"allow-remote", flag(&Config::allowRemote)},
-        {"body-seconds", seconds(&HttpLimits::bodyTime)},
-        {"head-seconds", seconds(&HttpLimits::headTime)},
+        {"body-seconds", seconds(someSeconds, &Config::limits, &HttpLimits::bodyTime)},
+        {"head-seconds", seconds(someSeconds, &Config::limits, &HttpLimits::headTime)},
         {"host-name", list(&Config::hostNames)},
-        {"idle-seconds", seconds(&HttpLimits::idleTime)},
-        {"io-threads", threads(&Config::ioThreads, ioThreadCount)},
+        {"idle-seconds", seconds(someSeconds, &Config::limits, &HttpLimits::idleTime)},
+        {"io-threads", count(ioThreadCount, &Config::ioThreads)},
         {"listen", list(&Config::listen)},
-        {"max-body", limit(&HttpLimits::body, bodyBytes)},
-        {"max-connections", limit(&HttpLimits::connections, connectionCount)},
-        {"max-head", limit(&HttpLimits::head, headBytes)},
+        {"max-body", count(bodyBytes, &Config::limits, &HttpLimits::body)},
+        {"max-connections", count(connectionCount, &Config::limits, &HttpLimits::connections)},
+        {"max-head", count(headBytes, &Config::limits, &HttpLimits::head)},
         {"module", list(&Config::modules)},
         {"print-ready", flag(&Config::printReady)},
         {"socket", text(&Config::socket)},
         {"state-root", text(&Config::stateRoot)},
-        {"stop-seconds",
-         {Form::number,
-          [](Config& config, const std::string& value) {
-              config.stopTime = std::chrono::seconds(number(value, noneOrSomeSeconds));
-          }}},
-        {"tls-certificate", tlsFile(&TlsFiles::certificate)},
-        {"tls-key", tlsFile(&TlsFiles::key)},
-        {"workers", threads(&Config::workers, workerCount)},
-        {"write-seconds", seconds(&HttpLimits::writeTime)},
+        {"stop-seconds", seconds(noneOrSomeSeconds, &Config::stopTime)},
+        {"tls-certificate", text(&Config::tls, &TlsFiles::certificate)},
+        {"tls-key", text(&Config::tls, &TlsFiles::key)},
+        {"workers", count(workerCount, &Config::workers)},
+        {"write-seconds", seconds(someSeconds, &Config::limits, &HttpLimits::writeTime)},
     };
 }
 

@@ -3,7 +3,6 @@
 #define VELT_HOST_API_APP_H
 
 #include "host/api/access_control.h"
-#include "host/api/event_hub.h"
 #include "host/api/events.h"
 #include "host/api/metrics.h"
 #include "host/api/openapi.h"

@@ -2,7 +2,7 @@
 #ifndef VELT_HOST_API_METRICS_H
 #define VELT_HOST_API_METRICS_H
 
-#include "host/api/event_hub.h"
+#include "host/api/events.h"
 #include "host/api/route.h"
 #include "host/module/module_call.h"
 

@@ -1,9 +1,8 @@
 #include "host/api/openapi.h"
 
 #include "base/number_text.h"
-#include "host/api/flat_schema.h"
+#include "host/api/json_schema.h"
 #include "host/api/openapi_document.h"
-#include "host/api/schema_words.h"
 #include "host/base/json.h"
 
 #include <valijson/adapters/jsoncpp_adapter.hpp>

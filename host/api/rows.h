@@ -2,7 +2,7 @@
 #ifndef VELT_HOST_API_ROWS_H
 #define VELT_HOST_API_ROWS_H
 
-#include "host/api/event_hub.h"
+#include "host/api/events.h"
 #include "host/api/metrics.h"
 #include "host/api/openapi.h"
 #include "host/api/revision.h"

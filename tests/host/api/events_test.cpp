@@ -1,6 +1,6 @@
 // The stream of events.
 
-#include "host/api/event_hub.h"
+#include "host/api/events.h"
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"

@@ -1,5 +1,5 @@
 // The table of the settings, the description of the API and the module say the same.
-#include "host/api/flat_schema.h"
+#include "host/api/json_schema.h"
 #include "host/base/json.h"
 #include "schema/settings_table.h"
 #include "tests/host/fake_standalone.h"

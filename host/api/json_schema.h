@@ -1,0 +1,23 @@
+// What a JSON schema says.
+#ifndef VELT_HOST_API_JSON_SCHEMA_H
+#define VELT_HOST_API_JSON_SCHEMA_H
+
+#include <json/value.h>
+
+#include <string>
+#include <vector>
+
+namespace velt::host {
+
+/// `part` of the document with what each "$ref" names in its place, and with the schemas of each "allOf"
+/// merged into one. References are to places in the document ("#/components/schemas/Token") and do not lead
+/// back to themselves.
+Json::Value flatSchema(const Json::Value& document, const Json::Value& part);
+
+/// What the schema expects at the path of property names and array indices: "an integer from 1 to 65535",
+/// "true or false". "a different value" when the schema does not say.
+std::string expectationOf(const Json::Value& schema, const std::vector<std::string>& path);
+
+} // namespace velt::host
+
+#endif
