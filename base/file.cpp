@@ -1,7 +1,5 @@
 #include "base/file.h"
 
-#include "base/unique_fd.h"
-
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -24,37 +22,11 @@ Result<> syncFolder(const fs::path& folder) {
     return {};
 }
 
-// Each new folder is made durable in the one that holds it, or a crash could take it away again together with
-// the file that was stored in it.
-Result<> makeFolder(const fs::path& folder) {
-    std::vector<fs::path> missing;
-    for (fs::path at = folder; !at.empty() && ::access(at.c_str(), F_OK) != 0; at = at.parent_path()) {
-        missing.push_back(at);
-        if (at == at.parent_path())
-            break;
-    }
-    for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
-        if (::mkdir(at->c_str(), 0755) != 0 && errno != EEXIST)
-            return cannot("make the folder", *at);
-        VELT_RETURN_IF_ERROR(syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")));
-    }
-    return {};
-}
-
-// The temporary file has one fixed name, so that what a crash leaves behind is taken up by the next store and
-// never piles up. Its lock keeps a second writer out until the first has renamed it; the second then holds a
-// file that has lost its name, and begins anew.
-UniqueFd openTemporary(const fs::path& path) {
-    for (;;) {
-        UniqueFd fd(::open(path.c_str(), O_WRONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0600));
-        if (!fd)
-            return fd;
-        while (::flock(fd.get(), LOCK_EX) != 0)
-            if (errno != EINTR)
-                return UniqueFd();
-        if (isSameFile(fd.get(), path))
-            return fd;
-    }
+bool isSameFile(int fd, const fs::path& path) {
+    struct stat opened {};
+    struct stat named {};
+    return ::fstat(fd, &opened) == 0 && ::lstat(path.c_str(), &named) == 0 && opened.st_dev == named.st_dev &&
+           opened.st_ino == named.st_ino;
 }
 
 } // namespace
@@ -77,20 +49,64 @@ bool writeAll(int fd, std::string_view contents) {
     return true;
 }
 
-bool isSameFile(int fd, const fs::path& path) {
-    struct stat opened {};
-    struct stat named {};
-    return ::fstat(fd, &opened) == 0 && ::lstat(path.c_str(), &named) == 0 && opened.st_dev == named.st_dev &&
-           opened.st_ino == named.st_ino;
+std::optional<std::string> readAll(int fd) {
+    std::string contents;
+    std::string block(65536, '\0');
+    for (;;) {
+        const ssize_t got = ::read(fd, block.data(), block.size());
+        if (got == 0)
+            return contents;
+        if (got > 0) {
+            contents.append(block, 0, static_cast<std::size_t>(got));
+        } else if (errno != EINTR) {
+            return std::nullopt;
+        }
+    }
 }
 
+UniqueFd openLocked(const fs::path& path, int flags, mode_t mode) {
+    for (;;) {
+        UniqueFd fd(::open(path.c_str(), flags | O_CREAT | O_NOFOLLOW | O_CLOEXEC, mode));
+        if (!fd)
+            return fd;
+        while (::flock(fd.get(), LOCK_EX) != 0)
+            if (errno != EINTR)
+                return UniqueFd();
+        if (isSameFile(fd.get(), path))
+            return fd;
+    }
+}
+
+bool fileExists(const fs::path& path) {
+    return ::access(path.c_str(), F_OK) == 0;
+}
+
+// Each new folder is made durable in the one that holds it, or a crash could take it away again together with
+// the file that was stored in it.
+Result<> makeFolder(const fs::path& folder) {
+    std::vector<fs::path> missing;
+    for (fs::path at = folder; !at.empty() && !fileExists(at); at = at.parent_path()) {
+        missing.push_back(at);
+        if (at == at.parent_path())
+            break;
+    }
+    for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
+        if (::mkdir(at->c_str(), 0755) != 0 && errno != EEXIST)
+            return cannot("make the folder", *at);
+        VELT_RETURN_IF_ERROR(syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")));
+    }
+    return {};
+}
+
+// The temporary file has one fixed name, so that what a crash leaves behind is taken up by the next store and
+// never piles up. Its lock keeps a second writer out until the first has renamed it.
 Result<> replaceFile(const fs::path& path, std::string_view contents, mode_t mode) {
     const fs::path folder = path.has_parent_path() ? path.parent_path() : fs::path(".");
     VELT_RETURN_IF_ERROR(makeFolder(folder));
     fs::path temporary = folder / ".";
     temporary += path.filename();
     temporary += ".new";
-    const UniqueFd fd = openTemporary(temporary);
+    const UniqueFd fd = openLocked(temporary, O_WRONLY, 0600);
     if (!fd)
         return cannot("make", temporary);
     if (::ftruncate(fd.get(), 0) != 0 || ::fchmod(fd.get(), mode) != 0 || !writeAll(fd.get(), contents) ||
@@ -113,18 +129,8 @@ Result<std::optional<std::string>> readOptionalFile(const fs::path& path) {
         return std::nullopt;
     if (!fd)
         return cannot("read", path);
-    std::string contents;
-    std::string block(65536, '\0');
-    for (;;) {
-        const ssize_t got = ::read(fd.get(), block.data(), block.size());
-        if (got == 0)
-            return contents;
-        if (got > 0) {
-            contents.append(block, 0, static_cast<std::size_t>(got));
-        } else if (errno != EINTR) {
-            return cannot("read", path);
-        }
-    }
+    auto contents = readAll(fd.get());
+    return contents ? Result<std::optional<std::string>>(std::move(contents)) : cannot("read", path);
 }
 
 Result<std::string> readFile(const fs::path& path) {

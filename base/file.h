@@ -3,6 +3,7 @@
 #define VELT_BASE_FILE_H
 
 #include "base/result.h"
+#include "base/unique_fd.h"
 
 #include <sys/types.h>
 
@@ -28,11 +29,22 @@ Result<std::optional<std::string>> readOptionalFile(const std::filesystem::path&
 /// made when it is missing. After a crash at any moment the old or the new file is there, whole. Thread-safe.
 Result<> replaceFile(const std::filesystem::path& path, std::string_view contents, mode_t mode);
 
+/// What comes until the end. Nothing, with errno set, when that fails.
+std::optional<std::string> readAll(int descriptor);
+
 /// Writes all of it. False, with errno set, when that fails.
 bool writeAll(int descriptor, std::string_view contents);
 
-/// Whether the path leads to the opened file, and not to a link or to a file that took its place.
-bool isSameFile(int descriptor, const std::filesystem::path& path);
+/// Opens the file with these flags, made with this mode when it is missing, and waits for its lock (flock,
+/// exclusive). It still has this name then: a file that was renamed meanwhile is left for the new one. No
+/// descriptor, with errno set, when that fails; a symbolic link is refused.
+UniqueFd openLocked(const std::filesystem::path& path, int flags, mode_t mode);
+
+/// Whether there is a file or folder; false also when that cannot be told.
+bool fileExists(const std::filesystem::path& path);
+
+/// Makes the folder, and those above it, where they are missing; durable on return.
+Result<> makeFolder(const std::filesystem::path& folder);
 
 } // namespace velt
 

@@ -15,6 +15,11 @@ std::string_view trimmed(std::string_view text);
 /// The text without those of the characters that it ends in.
 std::string_view trimmedEnd(std::string_view text, std::string_view characters);
 
+/// Whether the byte is a control character of ASCII.
+constexpr bool isControl(char byte) {
+    return static_cast<unsigned char>(byte) < 0x20 || byte == 0x7f;
+}
+
 /// The text with the letters A to Z as small ones.
 std::string lowerCase(std::string_view text);
 

@@ -68,6 +68,22 @@ UserEntry entryOf(const passwd& record, int source) {
             source};
 }
 
+GroupEntry entryOf(const group& record, int source) {
+    return {textOf(record.gr_name), record.gr_gid, source};
+}
+
+/// What the module's function finds for the key.
+template<class Key, class Record>
+auto lookUp(nss_status (*function)(Key, Record*, char*, std::size_t, int*), Key key, int source) {
+    std::vector<char> buffer(4096);
+    Record record{};
+    const auto look = [&](char* text, std::size_t size, int* error) {
+        return function(key, &record, text, size, error);
+    };
+    const bool found = function != nullptr && withBuffer(buffer, look);
+    return found ? std::optional(entryOf(record, source)) : std::nullopt;
+}
+
 } // namespace
 
 std::unique_ptr<NameService> NameService::load(const std::filesystem::path& folder, std::string_view name,
@@ -119,47 +135,19 @@ std::vector<UserEntry> NameService::users() const {
 }
 
 std::optional<UserEntry> NameService::userByName(const std::string& name) const {
-    std::vector<char> buffer(4096);
-    passwd record{};
-    if (functions_->getpwnam == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
-            return functions_->getpwnam(name.c_str(), &record, text, size, error);
-        })) {
-        return std::nullopt;
-    }
-    return entryOf(record, source_);
+    return lookUp(functions_->getpwnam, name.c_str(), source_);
 }
 
 std::optional<UserEntry> NameService::userById(uid_t uid) const {
-    std::vector<char> buffer(4096);
-    passwd record{};
-    if (functions_->getpwuid == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
-            return functions_->getpwuid(uid, &record, text, size, error);
-        })) {
-        return std::nullopt;
-    }
-    return entryOf(record, source_);
+    return lookUp(functions_->getpwuid, uid, source_);
 }
 
 std::optional<GroupEntry> NameService::groupByName(const std::string& name) const {
-    std::vector<char> buffer(4096);
-    group record{};
-    if (functions_->getgrnam == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
-            return functions_->getgrnam(name.c_str(), &record, text, size, error);
-        })) {
-        return std::nullopt;
-    }
-    return GroupEntry{textOf(record.gr_name), record.gr_gid, source_};
+    return lookUp(functions_->getgrnam, name.c_str(), source_);
 }
 
 std::optional<GroupEntry> NameService::groupById(gid_t gid) const {
-    std::vector<char> buffer(4096);
-    group record{};
-    if (functions_->getgrgid == nullptr || !withBuffer(buffer, [&](char* text, std::size_t size, int* error) {
-            return functions_->getgrgid(gid, &record, text, size, error);
-        })) {
-        return std::nullopt;
-    }
-    return GroupEntry{textOf(record.gr_name), record.gr_gid, source_};
+    return lookUp(functions_->getgrgid, gid, source_);
 }
 
 std::vector<gid_t> NameService::groupsOf(const std::string& user, gid_t primary) const {

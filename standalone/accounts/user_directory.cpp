@@ -12,6 +12,7 @@
 #include <array>
 #include <chrono>
 #include <mutex>
+#include <type_traits>
 
 namespace velt {
 
@@ -175,6 +176,18 @@ Modules Directory::modules() {
     return modules_;
 }
 
+/// What the first module that knows of it says.
+template<class Entry, class Key>
+std::optional<Entry> askModules(std::optional<Entry> (NameService::*lookUp)(Key) const,
+                                std::type_identity_t<Key> key) {
+    for (const auto& module : directory().modules()) {
+        if (std::optional<Entry> entry = ((*module).*lookUp)(key)) {
+            return entry;
+        }
+    }
+    return std::nullopt;
+}
+
 char lower(char character) {
     return character >= 'A' && character <= 'Z' ? static_cast<char>(character - 'A' + 'a') : character;
 }
@@ -209,12 +222,7 @@ std::optional<UserEntry> userByName(const std::string& name) {
     if (const UserEntry* user = snapshot->people.byName(name)) {
         return *user;
     }
-    for (const auto& module : directory().modules()) {
-        if (std::optional<UserEntry> user = module->userByName(name)) {
-            return user;
-        }
-    }
-    return std::nullopt;
+    return askModules(&NameService::userByName, name);
 }
 
 std::optional<UserEntry> userById(uid_t uid) {
@@ -225,36 +233,21 @@ std::optional<UserEntry> userById(uid_t uid) {
     if (const UserEntry* user = snapshot->people.byId(uid)) {
         return *user;
     }
-    for (const auto& module : directory().modules()) {
-        if (std::optional<UserEntry> user = module->userById(uid)) {
-            return user;
-        }
-    }
-    return std::nullopt;
+    return askModules(&NameService::userById, uid);
 }
 
 std::optional<GroupEntry> groupByName(const std::string& name) {
     if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byName(name)) {
         return *group;
     }
-    for (const auto& module : directory().modules()) {
-        if (std::optional<GroupEntry> group = module->groupByName(name)) {
-            return group;
-        }
-    }
-    return std::nullopt;
+    return askModules(&NameService::groupByName, name);
 }
 
 std::optional<GroupEntry> groupById(gid_t gid) {
     if (const auto snapshot = directory().groups(); const GroupEntry* group = snapshot->byId(gid)) {
         return *group;
     }
-    for (const auto& module : directory().modules()) {
-        if (std::optional<GroupEntry> group = module->groupById(gid)) {
-            return group;
-        }
-    }
-    return std::nullopt;
+    return askModules(&NameService::groupById, gid);
 }
 
 Result<UserEntry> findUser(const std::string& name) {

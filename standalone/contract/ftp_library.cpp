@@ -41,13 +41,12 @@ Result<> readRecord(_tag_VELT_FTP_CONF_& record) {
 }
 
 Result<> storeRecord(const _tag_VELT_FTP_CONF_& record) {
-    Result<> result = changeFtpSettings([&record](FtpSettings& settings) {
+    VELT_RETURN_IF_ERROR(changeFtpSettings([&record](FtpSettings& settings) {
         settings.record = lastSeenRecord().merge(settings.record, record);
-    });
+    }));
     // Not what was stored in the end: the caller goes on with its own copy.
-    if (result)
-        lastSeenRecord().note(record);
-    return result;
+    lastSeenRecord().note(record);
+    return {};
 }
 
 int noPlaceFor(const char* what) {

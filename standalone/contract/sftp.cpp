@@ -25,12 +25,11 @@ Result<> readRecord(_tag_VELT_SFTP_CONFIG_& record) {
 }
 
 Result<> storeSettings(const SftpSettings& wanted) {
-    Result<> result = changeSftpSettings(
-        [&wanted](SftpSettings& settings) { settings = lastSeenSettings().merge(settings, wanted); });
+    VELT_RETURN_IF_ERROR(changeSftpSettings(
+        [&wanted](SftpSettings& settings) { settings = lastSeenSettings().merge(settings, wanted); }));
     // Not what was stored in the end: the caller goes on with its own copy.
-    if (result)
-        lastSeenSettings().note(wanted);
-    return result;
+    lastSeenSettings().note(wanted);
+    return {};
 }
 
 } // namespace

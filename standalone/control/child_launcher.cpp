@@ -4,13 +4,13 @@
 #include "base/pipe.h"
 #include "base/spawning.h"
 #include "standalone/core/installed_files.h"
+#include "standalone/ports/port_range.h"
 
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <array>
 #include <cerrno>
-#include <chrono>
 #include <optional>
 #include <string_view>
 #include <vector>
@@ -18,17 +18,7 @@
 namespace velt {
 namespace {
 
-// A start is promised to be over within five seconds, of which the supervisor allows itself a little less.
-constexpr std::chrono::milliseconds startLimit{4900};
 constexpr int reportDescriptor = 3;
-
-std::string joinPorts(const std::vector<int>& ports) {
-    std::string text;
-    for (const int port : ports) {
-        text += (text.empty() ? "" : ",") + std::to_string(port);
-    }
-    return text;
-}
 
 /// Starts the program with `report` as its descriptor 3 and waits for its end, which comes at once: it goes
 /// on in a child of its own.
@@ -62,7 +52,7 @@ std::optional<std::string> readReport(int descriptor) {
 Result<> ChildLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
     VELT_ASSIGN_OR_RETURN(auto pipe, makePipe());
     std::vector<std::string> arguments{installedFile("velt-supervise").string(), folder.string(), daemon_,
-                                       order.configurationHash, joinPorts(order.ports)};
+                                       order.configurationHash, joinPorts(order.ports, ",")};
     arguments.insert(arguments.end(), order.arguments.begin(), order.arguments.end());
     VELT_RETURN_IF_ERROR(spawnDetached(arguments, pipe.writeEnd.get()));
     pipe.writeEnd.reset();

@@ -4,8 +4,9 @@
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
+#include <unistd.h>
+
 #include <filesystem>
-#include <system_error>
 
 namespace velt {
 namespace {
@@ -18,8 +19,7 @@ std::filesystem::path noteFile(const Daemon& daemon) {
 
 Result<> noteOutcome(const Daemon& daemon, Result<> outcome) {
     if (outcome) {
-        std::error_code ignored;
-        std::filesystem::remove(noteFile(daemon), ignored);
+        ::unlink(noteFile(daemon).c_str());
     } else {
         (void)replaceFile(noteFile(daemon), outcome.error().message, 0644);
     }

@@ -1,5 +1,7 @@
 #include "standalone/control/supervised_daemon.h"
 
+#include "base/file.h"
+#include "base/text.h"
 #include "standalone/control/child_launcher.h"
 #include "standalone/control/systemd_launcher.h"
 #include "standalone/core/error_number.h"
@@ -9,6 +11,7 @@
 #include "standalone/supervise/control_channel.h"
 
 #include <syslog.h>
+#include <unistd.h>
 
 #include <chrono>
 #include <optional>
@@ -21,9 +24,7 @@ namespace {
 
 using std::chrono::milliseconds;
 
-// A start is promised to be over within five seconds, of which the supervisor allows itself a little less. An
-// end that takes longer than this is taken out of the supervisor's hands.
-constexpr milliseconds startLimit{4900};
+// An end that takes longer than this is taken out of the supervisor's hands.
 constexpr milliseconds endLimit{6000};
 constexpr milliseconds farewellLimit{500};
 
@@ -87,11 +88,9 @@ Result<> SupervisedDaemon::handOver(const std::filesystem::path& folder, const P
     return {};
 }
 
-Error SupervisedDaemon::failure(const std::string& what, std::string reason, SourcePlace where) const {
-    while (!reason.empty() && (reason.back() == '.' || reason.back() == ' ')) {
-        reason.pop_back(); // daemons end their sentences as they like
-    }
-    return {ErrorNumber::daemon, titleOf(daemon_) + " " + what + ": " + reason + ".", where};
+Error SupervisedDaemon::failure(const std::string& what, std::string_view reason, SourcePlace where) const {
+    const std::string phrase(trimmedEnd(reason, ". ")); // daemons end their sentences as they like
+    return {ErrorNumber::daemon, titleOf(daemon_) + " " + what + ": " + phrase + ".", where};
 }
 
 Result<> SupervisedDaemon::pause() {
@@ -121,8 +120,7 @@ Result<> SupervisedDaemon::stop() {
     if (!endLeftovers(left)) {
         return failure("cannot be stopped", "some of its processes do not end");
     }
-    std::error_code ignored;
-    std::filesystem::remove(stateFile(statePath(paths::run), name_), ignored);
+    ::unlink(stateFile(statePath(paths::run), name_).c_str());
     return {};
 }
 
@@ -139,12 +137,7 @@ bool systemdKeepsSupervisors() {
 
 Result<std::filesystem::path> runFolder() {
     const std::filesystem::path folder = statePath(paths::run);
-    std::error_code error;
-    std::filesystem::create_directories(folder, error);
-    if (error) {
-        return Error(ErrorNumber::store,
-                     "Cannot make the folder " + folder.string() + ": " + error.message() + ".");
-    }
+    VELT_RETURN_IF_ERROR(makeFolder(folder));
     return folder;
 }
 

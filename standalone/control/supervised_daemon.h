@@ -11,6 +11,7 @@
 #include <filesystem>
 #include <memory>
 #include <string>
+#include <string_view>
 
 namespace velt {
 
@@ -36,7 +37,7 @@ public:
 private:
     Result<> handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
                       const DaemonOrder& order);
-    Error failure(const std::string& what, std::string reason,
+    Error failure(const std::string& what, std::string_view reason,
                   SourcePlace where = SourcePlace::current()) const;
 
     const Daemon& daemon_;

@@ -5,9 +5,13 @@
 #include "base/result.h"
 #include "standalone/supervise/daemon_order.h"
 
+#include <chrono>
 #include <filesystem>
 
 namespace velt {
+
+/// A start is promised to be over within five seconds, of which the supervisor allows itself a little less.
+inline constexpr std::chrono::milliseconds startLimit{4900};
 
 /// For one daemon. Its operations come one at a time. The folder is that of the files about running daemons.
 /// The message of an error is a phrase that continues "The FTP daemon does not start: ".

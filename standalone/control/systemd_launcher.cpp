@@ -1,5 +1,6 @@
 #include "standalone/control/systemd_launcher.h"
 #include "base/file.h"
+#include "base/text.h"
 
 #include "standalone/control/systemd_unit.h"
 #include "standalone/process/last_words.h"
@@ -7,21 +8,10 @@
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/daemon_state.h"
 
-#include <chrono>
 #include <utility>
 
 namespace velt {
 namespace {
-
-// A start is promised to be over within five seconds, of which the supervisor allows itself a little less.
-constexpr std::chrono::milliseconds startLimit{4900};
-
-std::string withoutLineEnd(std::string text) {
-    while (!text.empty() && text.back() == '\n') {
-        text.pop_back();
-    }
-    return text;
-}
 
 /// systemctl's own reason, where it has one.
 Error reasonOf(const ProcessResult& failed) {
@@ -76,13 +66,13 @@ Result<> SystemdLauncher::writeUnits(const std::filesystem::path& folder) const 
 
 /// What the supervisor said last.
 std::string SystemdLauncher::reasonOfFailure() const {
-    return withoutLineEnd(
-        runProcess({places_.systemctl, "show", "--value", "--property=StatusText", unit_}).output);
+    const ProcessResult shown =
+        runProcess({places_.systemctl, "show", "--value", "--property=StatusText", unit_});
+    return std::string(trimmedEnd(shown.output, "\n"));
 }
 
 Result<> SystemdLauncher::retire() {
-    std::error_code error;
-    if (!std::filesystem::exists(places_.units / unit_, error)) {
+    if (!fileExists(places_.units / unit_)) {
         return {};
     }
     const ProcessResult stopped = runProcess({places_.systemctl, "stop", unit_});

@@ -1,5 +1,6 @@
 #include "standalone/control/systemd_unit.h"
 
+#include "base/text.h"
 #include "standalone/core/installed_files.h"
 
 #include <array>
@@ -15,15 +16,14 @@ std::string unitName(const Daemon& daemon) {
 std::string quoteUnitWord(std::string_view argument) {
     std::string word = "\"";
     for (const char character : argument) {
-        const auto byte = static_cast<unsigned char>(character);
         if (character == '"' || character == '\\') {
             word += '\\';
             word += character;
         } else if (character == '%' || character == '$') {
             word.append(2, character); // no specifier, no variable
-        } else if (byte < 0x20 || byte == 0x7f) {
+        } else if (isControl(character)) {
             std::array<char, 5> escape{};
-            std::snprintf(escape.data(), escape.size(), "\\x%02x", static_cast<unsigned>(byte));
+            std::snprintf(escape.data(), escape.size(), "\\x%02x", static_cast<unsigned>(character));
             word += escape.data();
         } else {
             word += character;

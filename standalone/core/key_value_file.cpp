@@ -45,11 +45,6 @@ std::optional<FoundLine> findKey(std::string_view contents, std::string_view key
     return found;
 }
 
-bool isControl(char byte) {
-    const auto value = static_cast<unsigned char>(byte);
-    return value < 0x20 || value == 0x7f;
-}
-
 bool isKeyByte(char byte) {
     return (byte >= 'a' && byte <= 'z') || (byte >= 'A' && byte <= 'Z') || (byte >= '0' && byte <= '9') ||
            byte == '_' || byte == '-' || byte == '.';

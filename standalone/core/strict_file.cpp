@@ -35,11 +35,8 @@ Result<StrictFile> StrictFile::load(const std::filesystem::path& path, FileVersi
 Result<StrictFile> StrictFile::parse(std::string name, std::string_view contents, FileVersions versions) {
     StrictFile file(std::move(name));
     int number = 0;
-    for (std::size_t at = 0; at < contents.size();) {
-        const std::string_view line = contents.substr(at, contents.find('\n', at) - at);
-        file.readLine(line, ++number);
-        at += line.size() + 1;
-    }
+    while (!contents.empty())
+        file.readLine(cut(contents, '\n'), ++number);
     // A newer version tells more than a line whose form only that version knows.
     VELT_RETURN_IF_ERROR(file.readVersion(versions));
     if (file.problem_)

@@ -1,12 +1,11 @@
 #include "standalone/core/trusted_file.h"
 
-#include "base/unique_fd.h"
+#include "base/file.h"
 #include "standalone/core/error_number.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include <array>
 #include <cerrno>
 #include <cstring>
 
@@ -33,16 +32,11 @@ Result<std::string> readTrusted(const std::filesystem::path& path) {
     if ((facts.st_uid != 0 && facts.st_uid != getuid()) || (facts.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
         return refuse(path, "belongs to another account, or other accounts may write to it");
     }
-    std::string text;
-    std::array<char, 65536> part{};
-    ssize_t got = 0;
-    while ((got = read(file.get(), part.data(), part.size())) > 0) {
-        text.append(part.data(), static_cast<std::size_t>(got));
-    }
-    if (got < 0 || static_cast<off_t>(text.size()) != facts.st_size) {
+    auto text = readAll(file.get());
+    if (!text || static_cast<off_t>(text->size()) != facts.st_size) {
         return refuse(path, "cannot be read to its end");
     }
-    return text;
+    return *std::move(text);
 }
 
 } // namespace velt

@@ -1,5 +1,6 @@
 #include "standalone/daemons/daemon_configuration.h"
 
+#include "base/text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
@@ -10,9 +11,8 @@ namespace velt {
 
 bool isRenderable(const std::filesystem::path& path) {
     const std::string text = path.string();
-    return path.is_absolute() && text.size() <= 1024 && std::ranges::none_of(text, [](unsigned char c) {
-               return c < 0x20 || c == 0x7f || c == '"' || c == '\\' || c == '%' || c == '*';
-           });
+    return path.is_absolute() && text.size() <= 1024 && std::ranges::none_of(text, isControl) &&
+           text.find_first_of("\"\\%*") == std::string::npos;
 }
 
 Result<> runConfigurationTest(const std::string& label, const std::vector<std::string>& arguments) {

@@ -14,6 +14,7 @@
 #include "standalone/process/run_program.h"
 
 #include <syslog.h>
+#include <unistd.h>
 
 #include <filesystem>
 #include <string>
@@ -31,20 +32,23 @@ std::string firstLine(const std::string& text) {
     return text.substr(0, text.find('\n'));
 }
 
-Error cannotLoad(const ProcessResult& result) {
+Result<> load(const std::string& script) {
+    const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
+    if (result.exitCode == 0) {
+        return {};
+    }
     std::string reason(trimmedEnd(firstLine(result.errors), ". ")); // it may be a sentence of its own
     if (reason.find("Operation not permitted") != std::string::npos) {
         reason = "this process is not allowed to change the firewall";
     }
-    return {ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + "."};
+    return Error(ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + ".");
 }
 
 void warnOfForeignTables() {
     const std::vector<std::string> chains =
         foreignDropChains(runProcess({"nft", "--json", "list", "chains"}).output);
-    std::error_code ignored;
     if (chains.empty()) {
-        std::filesystem::remove(warningFile(), ignored);
+        ::unlink(warningFile().c_str());
         return;
     }
     std::string text;
@@ -63,18 +67,13 @@ void warnOfForeignTables() {
 /// The rules belong to the machine, so an installation below another root leaves them alone unless it was
 /// told about a firewall: its defaults would take away what the machine's own installation drops.
 bool mayTouchRules() {
-    std::error_code ignored;
-    return statePath("/") == "/" || std::filesystem::exists(statePath(paths::firewallSettings), ignored);
+    return statePath("/") == "/" || fileExists(statePath(paths::firewallSettings));
 }
 
 Result<> removeRules(const std::string& script) {
-    const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
-    if (result.exitCode != 0) {
-        return cannotLoad(result);
-    }
+    VELT_RETURN_IF_ERROR(load(script));
     noteRemoved();
-    std::error_code ignored;
-    std::filesystem::remove(warningFile(), ignored);
+    ::unlink(warningFile().c_str());
     return {};
 }
 
@@ -86,10 +85,7 @@ Result<> replaceRules(const std::string& script) {
     // Noted before it is done, since a note without rules does no harm.
     VELT_RETURN_IF_ERROR(noteLoading());
     const auto before = rulesetGeneration();
-    const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
-    if (result.exitCode != 0) {
-        return cannotLoad(result);
-    }
+    VELT_RETURN_IF_ERROR(load(script));
     noteLoaded(script, before);
     warnOfForeignTables();
     return {};

@@ -1,18 +1,13 @@
 #include "standalone/firewall/foreign_tables.h"
 
-#include <json/reader.h>
-#include <json/value.h>
-
-#include <memory>
+#include "base/json_text.h"
 
 namespace velt {
 
 std::vector<std::string> foreignDropChains(std::string_view chainsAsJson) {
-    Json::Value root;
-    const std::unique_ptr<Json::CharReader> reader(Json::CharReaderBuilder().newCharReader());
+    const Json::Value root = parseJson(chainsAsJson).valueOr({});
     std::vector<std::string> found;
-    if (!reader->parse(chainsAsJson.data(), chainsAsJson.data() + chainsAsJson.size(), &root, nullptr) ||
-        !root.isObject() || !root["nftables"].isArray()) {
+    if (!root.isObject() || !root["nftables"].isArray()) {
         return found;
     }
     const auto text = [](const Json::Value& chain, const char* key) {

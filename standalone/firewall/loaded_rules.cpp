@@ -8,10 +8,10 @@
 
 #include <sys/stat.h>
 #include <syslog.h>
+#include <unistd.h>
 
 #include <filesystem>
 #include <string>
-#include <system_error>
 
 namespace velt {
 namespace {
@@ -57,8 +57,7 @@ void noteLoaded(std::string_view script, std::optional<std::uint32_t> before) {
 }
 
 void noteRemoved() {
-    std::error_code ignored;
-    std::filesystem::remove(noteFile(), ignored);
+    ::unlink(noteFile().c_str());
 }
 
 } // namespace velt

@@ -1,14 +1,12 @@
 #include "standalone/journal/event_file.h"
 
 #include "base/file.h"
-#include "base/unique_fd.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
 #include <fcntl.h>
 #include <json/json.h>
-#include <sys/file.h>
 #include <syslog.h>
 #include <unistd.h>
 
@@ -41,23 +39,10 @@ Error cannotWrite(const std::filesystem::path& path, const char* why) {
     return {ErrorNumber::event, "Cannot write the event to " + path.string() + ": " + why + "."};
 }
 
-/// The file under its lock, which keeps other writers from adding their lines in between. Opened anew for
-/// each line: another writer, or a program of the administrator's, may have renamed it meanwhile.
-UniqueFd openLocked(const std::filesystem::path& path) {
-    for (;;) {
-        UniqueFd fd(::open(path.c_str(), O_RDWR | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0640));
-        if (!fd) {
-            return fd;
-        }
-        while (::flock(fd.get(), LOCK_EX) != 0) {
-            if (errno != EINTR) {
-                return UniqueFd();
-            }
-        }
-        if (isSameFile(fd.get(), path)) {
-            return fd;
-        }
-    }
+/// Its lock keeps other writers from adding their lines in between. Opened anew for each line: another
+/// writer, or a program of the administrator's, may have renamed it meanwhile.
+UniqueFd openLog(const std::filesystem::path& path) {
+    return openLocked(path, O_RDWR | O_APPEND, 0640);
 }
 
 std::filesystem::path kept(const std::filesystem::path& path, int number) {
@@ -122,12 +107,12 @@ Result<> appendEvent(const SystemEvent& event) {
     }
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
-    UniqueFd fd = openLocked(path);
+    UniqueFd fd = openLog(path);
     off_t size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
     if (size > 0 && static_cast<std::size_t>(size) + line.size() > largestEventFile) {
         rotate(path);
         fd.reset(); // or the lock of a file that could not be renamed would be waited for
-        fd = openLocked(path);
+        fd = openLog(path);
         size = fd ? ::lseek(fd.get(), 0, SEEK_END) : -1;
     }
     if (size < 0) {

@@ -22,6 +22,14 @@ std::optional<VELT_FTP_PORT_RANGE> parsePortRange(std::string_view text) {
     return VELT_FTP_PORT_RANGE{*first, *last};
 }
 
+std::string joinPorts(const std::vector<int>& ports, std::string_view separator) {
+    std::string text;
+    for (const int port : ports) {
+        text.append(text.empty() ? "" : separator).append(std::to_string(port));
+    }
+    return text;
+}
+
 std::string formatPortRange(const VELT_FTP_PORT_RANGE& range) {
     const std::string first = std::to_string(range.first);
     return range.first == range.last ? first : first + "-" + std::to_string(range.last);

@@ -1,5 +1,6 @@
 #include "standalone/rules/chroot_rule.h"
 
+#include "base/text.h"
 #include "standalone/accounts/user_directory.h"
 #include "standalone/core/error_number.h"
 
@@ -16,8 +17,7 @@ bool isComponent(std::string_view component) {
 } // namespace
 
 bool isRulePath(std::string_view path) {
-    if (path.empty() || path.front() != '/' ||
-        std::ranges::any_of(path, [](unsigned char c) { return c < 0x20 || c == 0x7f; })) {
+    if (path.empty() || path.front() != '/' || std::ranges::any_of(path, isControl)) {
         return false;
     }
     while (!path.empty()) {

@@ -28,14 +28,10 @@ bool enablesFtp(const _tag_VELT_FTP_CONF_& record) {
     return (record.service_flags & (VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS)) != 0;
 }
 
-bool hasCustomPassiveRange(const _tag_VELT_FTP_CONF_& record) {
-    return record.passive_port_min != 0 && record.passive_port_max != 0;
-}
-
 VELT_FTP_PORT_RANGE passiveRange(const _tag_VELT_FTP_CONF_& record) {
-    if (!hasCustomPassiveRange(record))
-        return defaultPassiveRange;
-    return {record.passive_port_min, record.passive_port_max};
+    const bool custom = record.passive_port_min != 0 && record.passive_port_max != 0;
+    return custom ? VELT_FTP_PORT_RANGE{record.passive_port_min, record.passive_port_max}
+                  : defaultPassiveRange;
 }
 
 } // namespace velt

@@ -44,10 +44,7 @@ int controlPort(const _tag_VELT_FTP_CONF_& record);
 /// Whether the record enables FTP or FTPS.
 bool enablesFtp(const _tag_VELT_FTP_CONF_& record);
 
-/// Whether the record has a custom passive range in force.
-bool hasCustomPassiveRange(const _tag_VELT_FTP_CONF_& record);
-
-/// The passive range in force: the custom one, or the default.
+/// The passive range in force: the custom one where both its ends are set, else the default.
 VELT_FTP_PORT_RANGE passiveRange(const _tag_VELT_FTP_CONF_& record);
 
 /// The stored settings, the defaults before the first store. Errors name the file and, where it is damaged,

@@ -10,8 +10,6 @@
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_files.h"
 
-#include <unistd.h>
-
 namespace velt {
 
 namespace {
@@ -27,10 +25,6 @@ Result<Settings> loadFile(std::string_view name, const SettingsFile<Settings>& f
 Result<> storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
     return perform(Effect::store, subject,
                    [&] { return replaceFile(statePath(name), contents, settingsMode); });
-}
-
-bool isMissing(std::string_view name) {
-    return ::access(statePath(name).c_str(), F_OK) != 0;
 }
 
 } // namespace
@@ -64,9 +58,9 @@ Result<> storeSftpSettings(const SftpSettings& settings) {
 
 Result<> writeMissingSettings() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    if (isMissing(paths::ftpSettings))
+    if (!fileExists(statePath(paths::ftpSettings)))
         VELT_RETURN_IF_ERROR(storeFtpSettings(defaultFtpSettings()));
-    return isMissing(paths::sftpSettings) ? storeSftpSettings(defaultSftpSettings()) : Result<>();
+    return fileExists(statePath(paths::sftpSettings)) ? Result<>() : storeSftpSettings(defaultSftpSettings());
 }
 
 } // namespace velt

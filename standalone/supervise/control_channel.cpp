@@ -1,6 +1,7 @@
 #include "standalone/supervise/control_channel.h"
 
 #include "base/input_wait.h"
+#include "base/number_text.h"
 
 #include <fcntl.h>
 #include <sys/socket.h>
@@ -12,7 +13,6 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
-#include <charconv>
 #include <cstring>
 #include <string_view>
 #include <utility>
@@ -136,11 +136,7 @@ Result<ControlRequest> decodeRequest(const std::string& message) {
         return request;
     }
     const auto number = [&fields](std::size_t index) {
-        int value = -1;
-        if (index < fields.size()) {
-            std::from_chars(fields[index].data(), fields[index].data() + fields[index].size(), value);
-        }
-        return value;
+        return static_cast<int>(index < fields.size() ? parseNumber(fields[index]).value_or(-1) : -1);
     };
     constexpr std::size_t firstPort = 3;
     const int portCount = number(2);

@@ -1,6 +1,8 @@
 #include "standalone/supervise/daemon_process.h"
 
 #include "base/spawning.h"
+#include "base/text.h"
+#include "standalone/ports/port_range.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/listening_sockets.h"
 
@@ -24,15 +26,6 @@ namespace {
 
 constexpr std::size_t keptLines = 20; // the reason comes first, and advice after it
 constexpr std::size_t longestLine = 400;
-
-/// The ports as people write them: "2121, 2122".
-std::string listPorts(const std::vector<int>& ports) {
-    std::string text;
-    for (const int port : ports) {
-        text += (text.empty() ? "" : ", ") + std::to_string(port);
-    }
-    return text;
-}
 
 } // namespace
 
@@ -82,7 +75,7 @@ Result<> DaemonProcess::waitUntilListening(const DaemonOrder& order, Clock::time
             readOutput();
             id_ = {};
             const std::string words = takeLastWords();
-            return Error("it did not listen on port " + listPorts(order.ports) + " in time" +
+            return Error("it did not listen on port " + joinPorts(order.ports, ", ") + " in time" +
                          (words.empty() ? "" : ": " + words));
         }
         pollfd output{output_.readEnd.get(), POLLIN, 0};
@@ -133,7 +126,7 @@ void DaemonProcess::readOutput() {
 
 void DaemonProcess::takeLine(std::string line) {
     // The lines end in state files, logs and answers, where control characters have no business.
-    std::erase_if(line, [](unsigned char character) { return character < 0x20 || character == 0x7f; });
+    std::erase_if(line, isControl);
     if (line.empty()) {
         return;
     }

@@ -10,6 +10,8 @@
 // In the second form it is a service manager's: it stays in the foreground, finds what to start in
 // FOLDER's order file, and says how that went as sd_notify(3) describes it.
 
+#include "base/number_text.h"
+#include "base/text.h"
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/service_manager.h"
 #include "standalone/supervise/supervisor.h"
@@ -21,7 +23,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <charconv>
 #include <csignal>
 #include <cstdio>
 #include <cstring>
@@ -43,18 +44,11 @@ constexpr int reportDescriptor = 3;
 std::optional<std::vector<int>> parsePorts(std::string_view text) {
     std::vector<int> ports;
     while (!text.empty()) {
-        int port = 0;
-        const auto [rest, problem] = std::from_chars(text.data(), text.data() + text.size(), port);
-        if (problem != std::errc{} || port < 1 || port > 65535) {
+        const auto port = velt::parseNumber(velt::cut(text, ','));
+        if (!port || *port < 1 || *port > 65535) {
             return std::nullopt;
         }
-        ports.push_back(port);
-        text.remove_prefix(static_cast<std::size_t>(rest - text.data()));
-        if (text.starts_with(',')) {
-            text.remove_prefix(1);
-        } else if (!text.empty()) {
-            return std::nullopt;
-        }
+        ports.push_back(static_cast<int>(*port));
     }
     return ports;
 }

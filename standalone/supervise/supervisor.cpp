@@ -167,8 +167,7 @@ Result<> Supervisor::stop() {
     if (!ended) {
         return Error("some of its processes do not end");
     }
-    std::error_code ignored;
-    std::filesystem::remove(stateFile(folder_, name_), ignored);
+    ::unlink(stateFile(folder_, name_).c_str());
     finished_ = true;
     return {};
 }

@@ -86,9 +86,8 @@ void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlace
     text.line("SocketBindTight on");
     text.line("Port", controlPort(record));
     // The firewall opens this range and no other, so it is never left to the kernel.
-    const bool custom = record.passive_port_min != 0 && record.passive_port_max != 0;
-    text.line("PassivePorts", custom ? record.passive_port_min : defaultPassiveRange.first,
-              custom ? record.passive_port_max : defaultPassiveRange.last);
+    const VELT_FTP_PORT_RANGE passive = passiveRange(record);
+    text.line("PassivePorts", passive.first, passive.last);
     // The directive would also take host and interface names, and announce what these resolve to.
     const auto external = record.use_ext_ip != 0 ? parseIPv4(settings.externalAddress) : std::nullopt;
     if (external) {

@@ -2,13 +2,14 @@
 
 #include "base/file.h"
 #include "base/sha256.h"
-#include "standalone/core/error_number.h"
 #include "standalone/core/scratch_folder.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/proftpd/proftpd_surroundings.h"
 #include "standalone/login/session_mounts.h"
 #include "standalone/rules/rule_store.h"
+
+#include <sys/stat.h>
 
 namespace velt {
 namespace {
@@ -24,18 +25,10 @@ Result<> testRendering(const FtpSettings& settings, ProftpdPlaces places) {
     return runConfigurationTest("FTP", {program, "-t", "-c", configuration.string()});
 }
 
-Result<> makeFolder(const std::filesystem::path& path) {
-    std::error_code error;
-    std::filesystem::create_directories(path, error);
-    if (!error) {
-        // Sessions walk through them as the user who logged in; nobody else may write there.
-        std::filesystem::permissions(path, std::filesystem::perms(0755), error);
-    }
-    if (error) {
-        return Error(ErrorNumber::store,
-                     "Cannot make the folder " + path.string() + ": " + error.message() + ".");
-    }
-    return {};
+// Sessions walk through it as the user who logged in; nobody else may write there.
+Result<> makePassableFolder(const std::filesystem::path& path) {
+    VELT_RETURN_IF_ERROR(makeFolder(path));
+    return ::chmod(path.c_str(), 0755) == 0 ? Result<>() : cannot("make the folder", path);
 }
 
 bool confinesAnonymous(const FtpSettings& settings) {
@@ -54,7 +47,7 @@ std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
 
 Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
     for (const auto& folder : {places.runFolder, places.loginRoot, places.anonymousShare.parent_path()}) {
-        VELT_RETURN_IF_ERROR(makeFolder(folder));
+        VELT_RETURN_IF_ERROR(makePassableFolder(folder));
     }
     VELT_RETURN_IF_ERROR(makeRulesFile());
     return confinesAnonymous(settings)

@@ -51,14 +51,9 @@ std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {
     return keys;
 }
 
-bool isThere(const std::filesystem::path& path) {
-    std::error_code error;
-    return std::filesystem::exists(path, error);
-}
-
 Result<> makeMissing(const std::vector<std::filesystem::path>& keys) {
     for (std::size_t i = 0; i < keys.size(); i++) {
-        if (isThere(keys[i])) {
+        if (fileExists(keys[i])) {
             continue;
         }
         VELT_RETURN_IF_ERROR(makeKey(std::string(kinds[i]), keys[i]));
@@ -79,11 +74,11 @@ Result<HostKeys> throwAwayKeys() {
 Result<HostKeys> hostKeys() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     HostKeys keys{keysIn(statePath(paths::hostKeys)), nullptr};
-    if (std::ranges::all_of(keys.files, isThere)) {
+    if (std::ranges::all_of(keys.files, fileExists)) {
         return keys;
     }
     VELT_RETURN_IF_ERROR(perform(Effect::store, "host keys", [&] { return makeMissing(keys.files); }));
-    return std::ranges::all_of(keys.files, isThere) ? Result<HostKeys>(std::move(keys)) : throwAwayKeys();
+    return std::ranges::all_of(keys.files, fileExists) ? Result<HostKeys>(std::move(keys)) : throwAwayKeys();
 }
 
 } // namespace velt

@@ -106,16 +106,11 @@ Result<ServerCertificate> throwAway() {
     return certificate;
 }
 
-bool isThere(const std::filesystem::path& path) {
-    std::error_code error;
-    return std::filesystem::exists(path, error);
-}
-
 } // namespace
 
 Result<ServerCertificate> serverCertificate() {
     const Pair given{statePath(paths::givenCertificate), statePath(paths::givenKey)};
-    if (isThere(given.certificate) || isThere(given.key)) {
+    if (fileExists(given.certificate) || fileExists(given.key)) {
         return load(given);
     }
     const Pair own{statePath(paths::ownCertificate), statePath(paths::ownKey)};
