@@ -27,9 +27,9 @@ public:
     /// Any method with its parameters. Null when the method answers without a value.
     Json::Value call(const ApiMethod& method, const Json::Value& parameters);
 
-    /// Runs `change`, which reads what it builds upon and then calls what it changes. When something is
-    /// changed by others in between, the server refuses the call and the whole of `change` runs again from
-    /// what is true then; Failure (conflict) when that happens too often.
+    /// Runs `change`, which reads the settings and then calls a method that changes them. If others change
+    /// something in between, the server refuses the call and `change` runs again from its start; Failure
+    /// (conflict) when that happens too often.
     void changeWhatWasRead(const std::function<void()>& change);
 
     /// For the paths of the server that are not methods; `path` starts with a slash.

@@ -9,7 +9,7 @@ namespace velt::cli {
 
 namespace {
 
-// Null when the server does not tell: a change must not fail for that.
+// Null when the server does not say: a change must not fail because of that.
 Json::Value servicesOf(ApiClient& api) {
     try {
         const Json::Value status = api.get("/api/status");
@@ -38,9 +38,9 @@ void lookUpSwitch(const Json::Value& services, const Setting& setting, CurrentSe
         current.stored[key] = stored;
     } else if (current.shown[key] == false) {
         current.doubts.push_back(key +
-                                 " was sent as off, because the server shows it so. If the service was only "
-                                 "down, it is switched off now: set " +
-                                 key + "=on to have it run.");
+                                 " was sent as off, because that is what the server shows. If the service "
+                                 "was only down, it is now switched off: set " +
+                                 key + "=on to run it.");
     }
 }
 

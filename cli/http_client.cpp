@@ -149,7 +149,7 @@ void HttpClient::prepare(const std::string& path) {
     if (!server_.token.empty()) {
         handle_->addHeader("Authorization: Bearer " + server_.token);
     }
-    handle_->addHeader("Expect:"); // a second round trip for nothing
+    handle_->addHeader("Expect:"); // which would cost a second round trip
 }
 
 void HttpClient::perform(bool mayBeStopped) {

@@ -18,7 +18,7 @@ struct HttpAnswer {
     std::string etag; ///< empty when the server names no state
 };
 
-/// Not for use by several threads at once.
+/// Not thread-safe.
 class HttpClient {
 public:
     explicit HttpClient(ServerAddress server);

@@ -73,7 +73,7 @@ void runCommand(const Command& command, const GlobalOptions& options, Console& c
 } // namespace
 
 void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
-    app.fallthrough(); // options may stand behind the command
+    app.fallthrough(); // options may follow the command
     app.require_subcommand(1);
     app.set_version_flag("--version", VELT_VERSION);
     app.footer(exitCodes);

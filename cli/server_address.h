@@ -11,7 +11,7 @@ namespace velt::cli {
 inline constexpr const char* defaultSocket = "/run/velt/veltd.sock";
 inline constexpr int defaultTimeoutSeconds = 60;
 
-/// What to do when something else than veltd seems to answer.
+/// What to do when something other than veltd seems to answer.
 inline constexpr const char* checkAddress = "Check that --url or VELT_URL is the address of veltd.";
 
 /// What the command line says about the server. An empty text was not given.

@@ -32,7 +32,8 @@ private:
 };
 
 /// Calls `onOpen` as soon as the server sends events, then `onEvent` for each, until that returns false, the
-/// user interrupts or the output cannot be written. Failure (access) when the server ends the stream before.
+/// user interrupts or the output cannot be written. Failure (access) when the server ends the stream before
+/// that.
 void followEvents(Context& context, const std::function<void()>& onOpen,
                   const std::function<bool(const std::string& event, const std::string& data)>& onEvent);
 

@@ -28,14 +28,14 @@ constexpr Meaning meanings[] = {
 };
 constexpr Meaning otherFailure{500, ExitCode::platform, "The server failed to carry out the request"};
 constexpr Meaning otherRefusal{400, ExitCode::refused, "The server refused the input"};
-constexpr Meaning noAnswerOfOurs{0, ExitCode::access, "The answer is not from veltd"};
+constexpr Meaning notFromVeltd{0, ExitCode::access, "The answer is not from veltd"};
 
 const Meaning& meaningOf(long status) {
     const auto* const found = std::ranges::find(meanings, status, &Meaning::status);
     if (found != std::end(meanings)) {
         return *found;
     }
-    return status >= 500 ? otherFailure : status >= 400 ? otherRefusal : noAnswerOfOurs;
+    return status >= 500 ? otherFailure : status >= 400 ? otherRefusal : notFromVeltd;
 }
 
 std::string accessHint(long status, const ServerAddress& server) {
@@ -65,7 +65,7 @@ std::string failureHint(const Json::Value& problem, bool reads) {
         problem["changed"].isBool() ? problem["changed"].asBool() : !reads && !problem.isMember("code");
     return changed ? "Part of the change may be in effect: check 'veltctl status' and 'veltctl log'. The "
                      "server's own log says more."
-                   : "Fix what the server names, in the request or on the server, and try again.";
+                   : "Fix the problem that the server names, then try again.";
 }
 
 std::string hintOf(long status, const Json::Value& problem, const ServerAddress& server, bool reads) {

@@ -108,8 +108,8 @@ Json::Value wantedOf(const SettingGroup& group, const Json::Value& section, cons
     return wanted;
 }
 
-// The server refuses a passive range over the control port of the moment, even when the same request moves
-// that port away: the port moves first then, beside the default range.
+// The server refuses a passive range that contains the current control port, even when the same request moves
+// that port away. So the port moves first, with the default range.
 std::vector<Json::Value> requestsFor(const Json::Value& wanted, const Json::Value& current) {
     if (!wanted.isMember("portnum") || !wanted.isMember("custom_port") ||
         !inRange(wanted["custom_port"].asString(), current["portnum"].asInt())) {
@@ -175,7 +175,7 @@ void planRules(ApiClient& api, const Json::Value& array, ImportPlan& plan) {
         }
     }
     if (step.changes.empty()) {
-        step.changes.emplace_back("another order of the same rules");
+        step.changes.emplace_back("the same rules in another order");
     }
     step.changesJson.append(changeToJson({"rules", rulesToJson(current), rulesToJson(wanted)}));
     step.apply = [&api, wanted] { api.changeWhatWasRead([&] { storeRules(api, wanted, loadRules(api)); }); };

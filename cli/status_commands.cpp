@@ -27,7 +27,7 @@ std::string stateOf(const Json::Value& service) {
     return shouldRun ? "down" : textAt(service, "enabled");
 }
 
-/// Why services are not in the state that their settings say. Services of one daemon share a reason.
+/// Why services are not in the state that their settings ask for. Services of one daemon share a reason.
 void writeReasons(Context& context, const Json::Value& services) {
     std::string last;
     for (const Json::Value& service : services) {

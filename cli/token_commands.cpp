@@ -42,7 +42,7 @@ void createToken(Context& context, const TokenOptions& options) {
     // Only the token goes to the output, so that it can be put into a file or a variable.
     context.console.err << "Token " << printable(textAt(token, "id")) << " for "
                         << printable(textAt(token, "name")) << " (" << printable(textAt(token, "role"))
-                        << "). It is shown only this once; keep it safe:\n";
+                        << "). It is shown only once; keep it safe:\n";
     context.console.out << printable(textAt(token, "token")) << '\n';
 }
 

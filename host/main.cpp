@@ -128,7 +128,7 @@ int main(int argc, char** argv) {
             std::printf("%s", config.help ? velt::host::usage() : "veltd " VELT_VERSION "\n");
             return 0;
         }
-        // What this process inherited is not for the programs that it starts.
+        // The programs that it starts must not get the descriptors that this process inherited.
         close_range(STDERR_FILENO + 1, ~0U, CLOSE_RANGE_CLOEXEC);
         const auto lock = InstanceLock::take(config.stateRoot);
         if (!lock) {

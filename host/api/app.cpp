@@ -43,7 +43,7 @@ HttpResponse notAllowed(const Call& call, const std::string& allow) {
 
 HttpResponse tooBusy(const Call& call) {
     HttpResponse response =
-        problem(503, "Too many requests are waiting, or the host is stopping. Try again later.", call.id);
+        problem(503, "Too many requests are waiting, or veltd is stopping. Try again later.", call.id);
     response.headers.emplace_back("Retry-After", "5");
     return response;
 }

@@ -117,11 +117,8 @@ Result<Json::Value> nextAfter(const std::vector<LogEntry>& page, LogFilter filte
     }
     filter.beforeId = page.back().id;
     filter.limit = 1;
-    const auto rest = queryLog(filter);
-    if (!rest) {
-        return rest.error();
-    }
-    return rest->empty() ? Json::Value() : Json::Value(Json::Int64{page.back().id});
+    VELT_ASSIGN_OR_RETURN(const auto rest, queryLog(filter));
+    return rest.empty() ? Json::Value() : Json::Value(Json::Int64{page.back().id});
 }
 
 HttpResponse answerPage(const LogFilter& filter, const Call& call) {

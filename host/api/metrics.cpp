@@ -46,15 +46,14 @@ struct Metrics::Families {
     Counters requests = counter("velt_requests_total", "Requests served by a module");
     prometheus::Family<prometheus::Histogram>& durations = prometheus::BuildHistogram()
                                                                .Name("velt_request_duration_seconds")
-                                                               .Help("Time that a module took for a request")
+                                                               .Help("Time a module took for a request")
                                                                .Register(registry);
     Counters refusals =
         counter("velt_refused_requests_total", "Requests refused before they reached a module");
     Gauges wanted = gauge("velt_service_enabled", "Whether a service is switched on");
     Gauges up = gauge("velt_service_up", "Whether a service runs");
-    Counters starts = counter("velt_daemon_starts_total", "Starts of a service that requests asked for");
-    Counters restarts =
-        counter("velt_daemon_restarts_total", "Starts of a daemon after it had ended by itself");
+    Counters starts = counter("velt_daemon_starts_total", "Service starts that requests asked for");
+    Counters restarts = counter("velt_daemon_restarts_total", "Restarts of a daemon that ended by itself");
     prometheus::Gauge& eventReaders = gauge("velt_event_readers", "Open streams of events").Add({});
     std::mutex mutex;
     std::map<std::string, std::uint64_t> seenRestarts;

@@ -32,8 +32,8 @@ public:
     /// Counts a start that a request asked for.
     void countDaemonStart(const std::string& service);
 
-    /// Takes over a count, kept elsewhere, of how often a daemon was started again after it ended by itself.
-    /// It may begin at 0 again.
+    /// How often a daemon was restarted after it ended by itself. The count is kept elsewhere and may begin
+    /// at 0 again.
     void setDaemonRestarts(const std::string& daemon, std::uint64_t count);
 
     void setEventReaders(std::size_t count);

@@ -31,15 +31,16 @@ Json::Value settingsOf(const Row& row, const Principal& principal) {
     return good ? outcome.data : Json::Value();
 }
 
-/// Tells what the modules answer about the services, and what is stored of a service without a module. The
+/// Reads what the modules answer about the services, and what is stored of a service without a module. The
 /// answer of "get" may be the state of this moment, but every "set" has to name the wanted one: a client that
 /// changes a single setting needs to know what is stored, or it would switch off a service that is just down.
-class Teller {
+class ServiceReader {
 public:
-    Teller(const ModuleTable& table, const Principal& principal) : table_(table), principal_(principal) {}
+    ServiceReader(const ModuleTable& table, const Principal& principal)
+        : table_(table), principal_(principal) {}
 
     /// Empty when the service's module is not loaded.
-    std::optional<Service> tell(const StoredService& stored) {
+    std::optional<Service> read(const StoredService& stored) {
         Service service{stored.name, {}, {}, stored.enabled, false, ""};
         const auto place = std::ranges::find(places, stored.name, &Place::service);
         if (place == places.end()) {
@@ -90,9 +91,9 @@ std::string titleOf(const ServiceDown& down) {
 std::vector<Service> listServices(const ModuleTable& table, const Principal& principal) {
     const std::vector<ServiceDown> down = servicesDown();
     std::vector<Service> services;
-    Teller teller(table, principal);
+    ServiceReader reader(table, principal);
     for (const StoredService& stored : storedServices()) {
-        if (auto service = teller.tell(stored)) {
+        if (auto service = reader.read(stored)) {
             addState(*service, stored.daemon, down);
             services.push_back(std::move(*service));
         }

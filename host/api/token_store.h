@@ -1,4 +1,4 @@
-// Bearer tokens. Only their hashes are stored, so the file is of no value to a thief.
+// Bearer tokens. Only their hashes are stored, so the file is useless to a thief.
 #ifndef VELT_HOST_API_TOKEN_STORE_H
 #define VELT_HOST_API_TOKEN_STORE_H
 

@@ -11,7 +11,7 @@ namespace velt::host {
 namespace {
 
 constexpr std::size_t maxName = 64;
-constexpr const char* noneMade = " No token was made.";
+constexpr const char* noneMade = " No token was created.";
 
 /// A name that is safe in logs: not empty, without control characters.
 bool isName(const Json::Value& value) {
@@ -42,7 +42,7 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
         return fieldProblem(422, {"role", "\"admin\" or \"viewer\""}, noneMade, call.id);
     }
     const auto [token, text] = store.create(name.asString(), *role);
-    log.write(call.id, "token " + token.id + " made for " + token.name + " (" + roleName(token.role) +
+    log.write(call.id, "token " + token.id + " created for " + token.name + " (" + roleName(token.role) +
                            ") by " + call.principal.actor);
     Json::Value value = toObject(token);
     value.removeMember("created");

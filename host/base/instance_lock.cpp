@@ -36,14 +36,14 @@ Result<InstanceLock> InstanceLock::take(const std::filesystem::path& stateRoot) 
     }
     const int error = errno;
     if (const auto other = file ? holderOf(file.get()) : std::nullopt) {
-        return Error("veltd already runs below " + stateRoot.string() + ", as process " +
+        return Error("veltd is already running below " + stateRoot.string() + " as process " +
                      std::to_string(*other) + ".");
     }
     return Error("Cannot lock " + path.string() + ": " + std::generic_category().message(error) + ".");
 }
 
 void InstanceLock::keepOverExec() const {
-    // A lock of this kind goes with any of its file's descriptors that the process closes.
+    // A lock of this kind is lost as soon as the process closes any descriptor of its file.
     ::fcntl(file_.get(), F_SETFD, 0);
 }
 

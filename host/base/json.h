@@ -1,4 +1,4 @@
-// JSON as clients send it and as it is answered. Thread-safe.
+// JSON in requests and answers. Thread-safe.
 #ifndef VELT_HOST_BASE_JSON_H
 #define VELT_HOST_BASE_JSON_H
 
@@ -11,7 +11,7 @@
 
 namespace velt::host {
 
-/// Reads one JSON object: UTF-8, no comments, no duplicate keys. Text of blanks alone is the empty object.
+/// Reads one JSON object: UTF-8, no comments, no duplicate keys. Blank text is the empty object.
 /// An error says what is wrong and where: "line 1, column 8: the text is not UTF-8".
 Result<Json::Value> parseObject(std::string_view text);
 

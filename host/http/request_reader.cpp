@@ -158,7 +158,7 @@ void RequestReader::fillRequest() {
     request_.host = text(message[http::field::host]);
     request_.origin = text(message[http::field::origin]);
     request_.fetchSite = text(message["Sec-Fetch-Site"]);
-    // With two of them it is open which one counts, so neither does.
+    // With two of them it is unclear which one counts, so neither does.
     const bool one = message.count(http::field::authorization) <= 1;
     request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
     request_.ifMatch = text(message[http::field::if_match]);

@@ -98,7 +98,7 @@ struct HttpServer::Core {
             setsockopt(socket.native_handle(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
         }
         const std::size_t open = connections.count();
-        // Idle strangers must not keep out those who have a request.
+        // Idle connections must not keep out clients that have a request.
         if (open >= limits.connections && !connections.makeRoom()) {
             if (!isTls && open < limits.connections + refusedConnections) {
                 make<PlainStream>(std::move(socket), std::move(peer))->refuse();

@@ -28,7 +28,8 @@ struct Outcome {
     double seconds = 0;
 };
 
-/// Calls the row's entry function on this thread, on behalf of the actor. Catches whatever the module throws.
+/// Calls the row's entry function on this thread, on behalf of the actor. Catches everything that the module
+/// throws.
 Outcome callRow(const Row& row, const Json::Value& parameters, const std::string& actor,
                 const std::string& address);
 

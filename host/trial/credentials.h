@@ -8,8 +8,7 @@
 
 namespace velt::host {
 
-// In the working folder, which is the state root, for all of these functions. Throw TrialError and
-// TokenError.
+// All of these work in the working folder, which is the state root, and throw TrialError or TokenError.
 
 /// The token that the last start has left; nothing when there is none or it is no longer valid.
 std::optional<std::string> storedToken();

@@ -20,23 +20,22 @@ namespace {
 
 constexpr int usageError = 2;
 
-/// The record of the trial, which a new one has not yet.
+/// The record of the trial; an empty one when the trial is new.
 TrialRecord checkedRecord(const TrialFolder& folder, const TrialPlace& place) {
     TrialRecord record = folder.record();
     if (!record.place.empty() && record.place != place.root) {
-        throw TrialError(folder.name() + " was made for " + record.place.string() + ", and this is " +
-                         place.root.string() + ". Stop what runs and remove " + folder.name() +
-                         " to begin anew.");
+        throw TrialError(folder.name() + " was made at " + record.place.string() + " and is now at " +
+                         place.root.string() + ". Stop the trial and remove " + folder.name() +
+                         " to start over.");
     }
     return record;
 }
 
-/// Whether veltd runs, of this build and with this token; otherwise it and its services are stopped.
+/// Whether veltd runs with the programs of this build and knows the token. Stops any other, and its services.
 bool runsAlready(bool sameBuild, bool hasToken) {
     const auto process = runningVeltd();
     if (process && !(sameBuild && hasToken)) {
-        std::printf("%s: it is started again.\n",
-                    sameBuild ? "veltd needs a new token" : "veltd was built anew");
+        std::printf("%s; restarting it.\n", sameBuild ? "veltd needs a new token" : "veltd has been rebuilt");
         endVeltd();
         check(stopServices());
         return false;
@@ -45,7 +44,7 @@ bool runsAlready(bool sameBuild, bool hasToken) {
     if (!process || !waitForVeltd()) {
         return false;
     }
-    std::printf("veltd runs already, as process %d.\n", static_cast<int>(*process));
+    std::printf("veltd is already running as process %d.\n", static_cast<int>(*process));
     return true;
 }
 
@@ -68,7 +67,7 @@ void start(const TrialFolder& folder) {
         record = {place.root, chooseHttpPort(record.httpPort), build};
         folder.store(record);
         const pid_t started = launchVeltd(folder.path(), place, record.httpPort);
-        std::printf("veltd runs, as process %d.\n", static_cast<int>(started));
+        std::printf("veltd is running as process %d.\n", static_cast<int>(started));
     }
     const std::string url = "http://127.0.0.1:" + std::to_string(record.httpPort);
     writeEnvironment(url, *token, programs);

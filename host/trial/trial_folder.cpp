@@ -50,9 +50,9 @@ TrialFolder::TrialFolder(const std::filesystem::path& folder, bool forStop)
     }
     if (status.st_uid != ::geteuid() && !(forStop && ::geteuid() == 0)) {
         const std::string owner = userName(status.st_uid);
-        throw TrialError(name_ + " was made by " + owner + ". " +
+        throw TrialError(name_ + " belongs to " + owner + ". " +
                          (forStop ? "Stop it as that user, or as root."
-                                  : "Start as that user, or stop what runs and remove " + name_ + "."));
+                                  : "Start as that user, or stop the trial and remove " + name_ + "."));
     }
     if (::flock(lock_.get(), LOCK_EX) != 0) {
         throw TrialError(cannot("lock", name_ + lockFile));
@@ -67,7 +67,7 @@ TrialRecord TrialFolder::record() const {
     const auto object = parseObject(*text);
     if (!object || !(*object)["place"].isString() || !(*object)["http_port"].isInt() ||
         !(*object)["build"].isString()) {
-        throw TrialError(name_ + recordFile + " is damaged. Stop what runs and remove " + name_ + ".");
+        throw TrialError(name_ + recordFile + " is damaged. Stop the trial and remove " + name_ + ".");
     }
     return {(*object)["place"].asString(), (*object)["http_port"].asInt(), (*object)["build"].asString()};
 }

@@ -43,9 +43,10 @@ TrialPlace findPlace(const std::filesystem::path& folder) {
         return {folder, false};
     }
     if (!mayMount()) {
-        throw TrialError("The account ftp, which serves anonymous users, cannot get to " + folder.string() +
-                         ": a folder on the way is closed.\nMove this tree to a folder that everybody may "
-                         "enter, such as /srv, and start again.");
+        throw TrialError(
+            "The account ftp, which serves anonymous users, cannot reach " + folder.string() +
+            ": a folder on the way is closed to it.\nMove this tree to a folder that everybody may "
+            "enter, such as /srv, and start again.");
     }
     return {mountedRoot, true};
 }

@@ -77,8 +77,8 @@ bool waitForAnswer(const std::function<bool()>& runs) {
     ::dup2(::open("/dev/null", O_RDWR | O_CLOEXEC), STDIN_FILENO);
     ::dup2(log, STDOUT_FILENO);
     ::dup2(log, STDERR_FILENO);
-    // veltd keeps the lock. Until it runs, this process also holds the trial's lock, so whoever waits for
-    // that finds veltd afterwards.
+    // veltd keeps the lock. Until it runs, this process also holds the trial's lock, so that another start or
+    // stop, which waits for that, finds veltd afterwards.
     const auto lock = InstanceLock::take(".");
     if (!lock) {
         std::fprintf(stderr, "%s\n", lock.error().message.c_str());
@@ -174,7 +174,7 @@ void endVeltd() {
     }
     pollfd ended{handle.get(), POLLIN, 0};
     if (::pidfd_send_signal(handle.get(), SIGTERM, nullptr, 0) != 0 || ::poll(&ended, 1, longestEnd) != 1) {
-        throw TrialError("veltd, process " + std::to_string(*process) + ", does not end.");
+        throw TrialError("veltd (process " + std::to_string(*process) + ") does not stop.");
     }
 }
 
@@ -187,8 +187,8 @@ int chooseHttpPort(int former) {
             return port;
         }
     }
-    throw TrialError("The ports " + std::to_string(firstHttpPort) + " to " + std::to_string(lastHttpPort) +
-                     " of 127.0.0.1 are taken.");
+    throw TrialError("Ports " + std::to_string(firstHttpPort) + " to " + std::to_string(lastHttpPort) +
+                     " of 127.0.0.1 are all taken.");
 }
 
 } // namespace velt::host

@@ -158,7 +158,7 @@ TEST_F(DocumentTest, TheOrderOfRulesCounts) {
         R"([{"type": "user", "name": "anna", "path": "/a"}, {"type": "user", "name": "ben", "path": "/b"}])");
     Json::Value document = exported();
     std::swap(document["chroot_rules"][0], document["chroot_rules"][1]);
-    EXPECT_EQ(import(document).out, "chroot_rules  another order of the same rules\n");
+    EXPECT_EQ(import(document).out, "chroot_rules  the same rules in another order\n");
     EXPECT_EQ(host.rules[0]["name"], "ben");
 }
 

@@ -121,7 +121,7 @@ TEST_F(QuickStart, aSecondStartChangesNothing) {
     const std::string first = run(tree_, startBuilt);
     const std::string settings = run(tree_, ". var/env; veltctl ftp set enable_ftp=on; veltctl export");
     const std::string second = run(tree_, startBuilt);
-    EXPECT_TRUE(contains(second, "veltd runs already, as process " + processIn(first) + ".")) << second;
+    EXPECT_TRUE(contains(second, "veltd is already running as process " + processIn(first) + ".")) << second;
     EXPECT_TRUE(contains(second, "127.0.0.1:2121, on and off")) << second;
     EXPECT_EQ("enable_ftp: off -> on\n" + run(tree_, ". var/env; veltctl export"), settings);
     EXPECT_EQ(modeOf(tree_ / "var/token"), 0600U);
@@ -156,7 +156,7 @@ TEST_F(QuickStart, aVeltdThatIsKilledLeavesServicesThatAreFound) {
     const std::string first = run(tree_, startBuilt + "; . var/env; veltctl ftp set enable_ftp=on");
     run(tree_, "kill -KILL " + processIn(first));
     const std::string second = run(tree_, startBuilt);
-    EXPECT_TRUE(contains(second, "veltd runs, as process ")) << second;
+    EXPECT_TRUE(contains(second, "veltd is running as process ")) << second;
     EXPECT_TRUE(contains(second, "127.0.0.1:2121, on and off")) << second;
     run(tree_, "kill -KILL " + processIn(second));
     expectNothingRuns("after both were killed");
@@ -167,7 +167,7 @@ TEST_F(QuickStart, veltdRunsOnceForAFolder) {
     const std::string second =
         run(tree_, std::string(VELT_BUILT_FOLDER) + "/veltd --state-root var --socket other --module " +
                        VELT_BUILT_FOLDER + "/VELT.Core.FileServ.FTP.so; echo $?");
-    EXPECT_TRUE(contains(second, "veltd: veltd already runs below var, as process ")) << second;
+    EXPECT_TRUE(contains(second, "veltd: veltd is already running below var as process ")) << second;
     EXPECT_TRUE(second.ends_with("\n1\n")) << second;
 }
 
@@ -177,15 +177,15 @@ TEST_F(QuickStart, anotherUserIsToldWhoseItIs) {
     const std::vector<std::string> asAlice{"setpriv", "--reuid", "alice",
                                            "--regid", "alice",   "--clear-groups"};
     const std::string start =
-        "var/ was made by root. Start as that user, or stop what runs and remove var/.\n1\n";
+        "var/ belongs to root. Start as that user, or stop the trial and remove var/.\n1\n";
     EXPECT_EQ(run(tree_, startBuilt + "; echo $?", asAlice), start);
     EXPECT_EQ(run(tree_, "scripts/start; echo $?", asAlice), start) << "before anything is built";
     EXPECT_EQ(run(tree_, "scripts/start --stop; echo $?", asAlice),
-              "var/ was made by root. Stop it as that user, or as root.\n1\n");
+              "var/ belongs to root. Stop it as that user, or as root.\n1\n");
     fs::permissions(tree_, fs::perms(0755));
     EXPECT_EQ(run(tree_, "scripts/start; echo $?", asAlice),
               "You may not write to /mnt/tour. Start as root, or from a copy of your own.\n1\n");
-    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd runs already"));
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd is already running"));
 }
 
 TEST_F(QuickStart, aPathThatTheDaemonsCannotHoldIsRefusedAtOnce) {
@@ -225,7 +225,7 @@ TEST_F(QuickStart, saysWhyItCannotGoOn) {
 TEST_F(QuickStart, aTokenThatIsLostIsReplaced) {
     run(tree_, startBuilt + "; . var/env; veltctl ftp set enable_ftp=on; rm var/token");
     const std::string second = run(tree_, startBuilt);
-    EXPECT_TRUE(contains(second, "veltd needs a new token: it is started again.\nveltd runs, as process "))
+    EXPECT_TRUE(contains(second, "veltd needs a new token; restarting it.\nveltd is running as process "))
         << second;
     EXPECT_TRUE(contains(second, "127.0.0.1:2121, on and off")) << second;
     EXPECT_EQ(run(tree_, ". var/env; veltctl ftp set enable_ftp=off"), "enable_ftp: on -> off\n");
@@ -240,7 +240,7 @@ TEST_F(QuickStart, takesOtherPortsWhereItsOwnAreTaken) {
     EXPECT_TRUE(contains(second, "127.0.0.1:2122, off")) << second;
     EXPECT_TRUE(contains(second, "127.0.0.1:2223, off")) << second;
     EXPECT_TRUE(contains(run(other, "scripts/start --stop"), "stopped"));
-    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd runs already"))
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd is already running"))
         << "it was not the one that was stopped";
     fs::remove_all(other);
 }
@@ -268,7 +268,7 @@ TEST_F(QuickStart, servesWhoeverBecameRootForTheStart) {
                   "curl -sS -H \"Authorization: Bearer $VELT_TOKEN\" $VELT_URL/healthz",
                   {"setpriv", "--reuid", "alice", "--regid", "alice", "--clear-groups"}),
               R"({"status":"ok"})");
-    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd runs already"));
+    EXPECT_TRUE(contains(run(tree_, startBuilt), "veltd is already running"));
 }
 
 TEST_F(QuickStart, saysWhenFtpCannotWork) {
@@ -312,10 +312,10 @@ TEST_F(QuickStart, worksWithoutRootsRights) {
     EXPECT_EQ(modeOf(tree_ / "var/demo-password"), 0600U);
     fs::last_write_time(fs::path(built) / "veltctl", fs::file_time_type::clock::now());
     const std::string rebuilt = run(tree_, startHere, asCarol);
-    EXPECT_TRUE(contains(rebuilt, "veltd was built anew: it is started again.\nveltd runs, as process "))
+    EXPECT_TRUE(contains(rebuilt, "veltd has been rebuilt; restarting it.\nveltd is running as process "))
         << rebuilt;
     EXPECT_TRUE(contains(rebuilt, "127.0.0.1:2121, on and off")) << rebuilt;
-    EXPECT_TRUE(contains(run(tree_, startHere), "var/ was made by carol."))
+    EXPECT_TRUE(contains(run(tree_, startHere), "var/ belongs to carol."))
         << "root takes over what is carol's";
     run(tree_, "scripts/start --stop");
     fs::remove_all(built);
