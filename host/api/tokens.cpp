@@ -1,6 +1,7 @@
 #include "host/api/tokens.h"
 
 #include "base/json_value.h"
+#include "base/text.h"
 #include "host/api/problem.h"
 #include "host/base/json.h"
 
@@ -16,9 +17,7 @@ constexpr const char* noneMade = " No token was created.";
 /// A name that is safe in logs: not empty, without control characters.
 bool isName(const Json::Value& value) {
     const std::string name = value.isString() ? value.asString() : "";
-    return !name.empty() && name.size() <= maxName && std::all_of(name.begin(), name.end(), [](char c) {
-        return static_cast<unsigned char>(c) >= 0x20 && c != 0x7F;
-    });
+    return !name.empty() && name.size() <= maxName && std::ranges::none_of(name, isControl);
 }
 
 HttpResponse list(const TokenStore& store) {

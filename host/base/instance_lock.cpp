@@ -1,9 +1,10 @@
 #include "host/base/instance_lock.h"
 
+#include "base/file.h"
+
 #include <fcntl.h>
 
 #include <cerrno>
-#include <system_error>
 
 namespace velt::host {
 
@@ -25,8 +26,7 @@ std::optional<pid_t> holderOf(int descriptor) {
 
 Result<InstanceLock> InstanceLock::take(const std::filesystem::path& stateRoot) {
     const std::filesystem::path path = lockPath(stateRoot);
-    std::error_code ignored; // shows when the file is opened
-    std::filesystem::create_directories(path.parent_path(), ignored);
+    VELT_RETURN_IF_ERROR(makeFolder(path.parent_path()));
     UniqueFd file(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, 0644));
     struct flock whole {};
     whole.l_type = F_WRLCK;
@@ -39,7 +39,7 @@ Result<InstanceLock> InstanceLock::take(const std::filesystem::path& stateRoot) 
         return Error("veltd is already running below " + stateRoot.string() + " as process " +
                      std::to_string(*other) + ".");
     }
-    return Error("Cannot lock " + path.string() + ": " + std::generic_category().message(error) + ".");
+    return cannot("lock", path, error);
 }
 
 void InstanceLock::keepOverExec() const {

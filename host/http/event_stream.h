@@ -110,9 +110,7 @@ private:
 
     std::shared_ptr<Session<Stream>> session_;
     boost::asio::strand<Executor> strand_;
-    boost::asio::basic_waitable_timer<std::chrono::steady_clock,
-                                      boost::asio::wait_traits<std::chrono::steady_clock>, Executor>
-        heartbeat_;
+    Timer heartbeat_;
     std::deque<Text> queue_;
     std::size_t queued_ = 0;
     bool ended_ = false;

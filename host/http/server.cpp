@@ -23,8 +23,6 @@ namespace {
 namespace asio = boost::asio;
 
 using Acceptor = asio::basic_socket_acceptor<asio::generic::stream_protocol, Executor>;
-using Timer = asio::basic_waitable_timer<std::chrono::steady_clock,
-                                         asio::wait_traits<std::chrono::steady_clock>, Executor>;
 
 constexpr std::chrono::milliseconds acceptPause{50};
 /// How many connections beyond the limit get a 503.

@@ -29,6 +29,9 @@ namespace velt::host {
 using Executor = boost::asio::io_context::executor_type;
 using PlainStream = boost::asio::basic_stream_socket<boost::asio::generic::stream_protocol, Executor>;
 using TlsStream = boost::asio::ssl::stream<PlainStream>;
+using Timer =
+    boost::asio::basic_waitable_timer<std::chrono::steady_clock,
+                                      boost::asio::wait_traits<std::chrono::steady_clock>, Executor>;
 using Error = boost::system::error_code;
 
 template<class Stream> class EventStream;
@@ -237,9 +240,7 @@ private:
 
     SessionShared& shared_;
     Stream stream_;
-    boost::asio::basic_waitable_timer<std::chrono::steady_clock,
-                                      boost::asio::wait_traits<std::chrono::steady_clock>, Executor>
-        timer_;
+    Timer timer_;
     Peer peer_;
     HttpHandler& handler_;
     const HttpLimits& limits_;

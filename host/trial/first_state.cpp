@@ -17,7 +17,6 @@
 #include <unistd.h>
 
 #include <cstdio>
-#include <system_error>
 
 namespace velt::host {
 
@@ -47,11 +46,7 @@ void giveDemoToAnonymousUsers() {
 
 void makeDemoShare(const std::filesystem::path& place) {
     const bool root = ::geteuid() == 0;
-    std::error_code error;
-    std::filesystem::create_directory(demo, error);
-    if (error) {
-        throw TrialError(cannot("make the folder", demo, error.value()));
-    }
+    check(makeFolder(demo));
     if (root) {
         giveDemoToAnonymousUsers();
     } else {

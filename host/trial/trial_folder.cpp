@@ -10,8 +10,6 @@
 #include <sys/file.h>
 #include <sys/stat.h>
 
-#include <system_error>
-
 namespace velt::host {
 
 namespace {
@@ -22,11 +20,7 @@ constexpr const char* lockFile = "start.lock";
 } // namespace
 
 TrialFolder TrialFolder::forStart(const std::filesystem::path& folder) {
-    std::error_code error;
-    std::filesystem::create_directories(folder, error);
-    if (error) {
-        throw TrialError(cannot("make the folder", folder, error.value()));
-    }
+    check(makeFolder(folder));
     return {folder, false};
 }
 
