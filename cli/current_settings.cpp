@@ -20,9 +20,6 @@ Json::Value servicesOf(ApiClient& api) {
 }
 
 Json::Value storedSwitch(const Json::Value& services, const std::string& service) {
-    if (!services.isArray()) {
-        return {};
-    }
     for (const Json::Value& each : services) {
         if (each.isObject() && each["name"] == service && each["wanted"].isBool()) {
             return each["wanted"];
@@ -51,7 +48,7 @@ Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
     const auto missing = [&](const Setting& setting) {
         return setting.service != nullptr && !hasType(shown[setting.key], setting.type);
     };
-    if (!shown.isObject() || std::any_of(group.settings.begin(), group.settings.end(), missing)) {
+    if (!shown.isObject() || std::ranges::any_of(group.settings, missing)) {
         throw unexpectedAnswer(std::string("The server's answer contains no ") + group.command +
                                " settings.");
     }
@@ -62,13 +59,11 @@ CurrentSettings readCurrentSettings(ApiClient& api, const SettingGroup& group, c
     CurrentSettings current;
     current.shown = readSettings(api, group);
     current.stored = current.shown;
-    std::vector<Setting> switches;
-    std::copy_if(group.settings.begin(), group.settings.end(), std::back_inserter(switches),
-                 [&](const Setting& each) { return each.service != nullptr && !wanted.isMember(each.key); });
-    if (!switches.empty()) {
-        const Json::Value services = servicesOf(api);
-        for (const Setting& each : switches) {
-            lookUpSwitch(services, each, current);
+    std::optional<Json::Value> services; // asked for once at most
+    for (const Setting& each : group.settings) {
+        if (each.service != nullptr && !wanted.isMember(each.key)) {
+            services = services ? services : servicesOf(api);
+            lookUpSwitch(*services, each, current);
         }
     }
     return current;

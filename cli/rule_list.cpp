@@ -91,7 +91,7 @@ void storeRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& bef
                     "The server does not know the user or group of a rule, or does not accept its folder.",
                     "Correct these rules and try again.");
     for (const ChrootRule& rule : rules) {
-        if (std::find(stored.begin(), stored.end(), rule) == stored.end()) {
+        if (std::ranges::find(stored, rule) == stored.end()) {
             dropped.note("left out: " + ruleToText(rule));
         }
     }

@@ -43,7 +43,7 @@ std::string readToken(const AddressOptions& options, Console& console) {
 // A line end in the token would start a header of its own.
 void checkToken(const ServerAddress& server) {
     const std::string& token = server.token;
-    if (std::any_of(token.begin(), token.end(), [](unsigned char c) { return c <= 0x20 || c >= 0x7F; })) {
+    if (std::ranges::any_of(token, [](unsigned char c) { return c <= 0x20 || c >= 0x7F; })) {
         throw Failure(ExitCode::usage, "The token contains characters that are not allowed.",
                       "Copy the token again; it is a single word.");
     }

@@ -40,11 +40,10 @@ Json::Value parseValue(const std::string& word, SettingType type) {
 
 SettingGroup groupOf(const schema::SettingGroup& table, int version) {
     SettingGroup group{table.name, table.api, version, {}};
-    std::copy_if(table.settings.begin(), table.settings.end(), std::back_inserter(group.settings),
-                 [version](const Setting& setting) {
-                     return setting.key != nullptr &&
-                            (setting.apiVersion == 0 || setting.apiVersion == version);
-                 });
+    std::ranges::copy_if(
+        table.settings, std::back_inserter(group.settings), [version](const Setting& setting) {
+            return setting.key != nullptr && (setting.apiVersion == 0 || setting.apiVersion == version);
+        });
     return group;
 }
 
@@ -66,8 +65,7 @@ void completePassiveRange(Json::Value& change, const Json::Value& current) {
 } // namespace
 
 const Setting* SettingGroup::find(const std::string& key) const {
-    const auto found = std::find_if(settings.begin(), settings.end(),
-                                    [&](const Setting& setting) { return key == setting.key; });
+    const auto found = std::ranges::find(settings, key, &Setting::key);
     return found == settings.end() ? nullptr : &*found;
 }
 

@@ -76,7 +76,7 @@ void checkTop(const Json::Value& document, std::vector<std::string>& faults) {
     static const std::vector<std::string> known = {"format",   "format_version", "ftp",
                                                    "security", rulesSection,     "sftp"};
     for (const std::string& name : document.getMemberNames()) {
-        if (std::find(known.begin(), known.end(), name) == known.end()) {
+        if (std::ranges::find(known, name) == known.end()) {
             faults.push_back(name + ": unknown section");
         }
     }
@@ -160,7 +160,7 @@ void planRules(ApiClient& api, const Json::Value& array, ImportPlan& plan) {
         return;
     }
     const auto holds = [](const ChrootRules& rules, const ChrootRule& rule) {
-        return std::find(rules.begin(), rules.end(), rule) != rules.end();
+        return std::ranges::find(rules, rule) != rules.end();
     };
     ImportStep step;
     step.section = rulesSection;

@@ -93,7 +93,7 @@ void showEvents(Context& context, const EventOptions& options) {
         context, [] {},
         [&](const std::string& event, const std::string& data) {
             const auto& kinds = options.kinds;
-            if (kinds.empty() || std::find(kinds.begin(), kinds.end(), event) != kinds.end()) {
+            if (kinds.empty() || std::ranges::find(kinds, event) != kinds.end()) {
                 writeEvent(context, event, data);
                 ++seen;
             }

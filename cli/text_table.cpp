@@ -18,7 +18,7 @@ std::size_t characters(const std::string& text) {
 } // namespace
 
 void Table::add(std::vector<std::string> cells) {
-    std::transform(cells.begin(), cells.end(), cells.begin(), printable);
+    std::ranges::transform(cells, cells.begin(), printable);
     rows_.push_back(std::move(cells));
 }
 

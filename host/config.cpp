@@ -29,6 +29,7 @@ enum class Form {
 struct Setting {
     Form form;
     std::function<void(Config&, const std::string& value)> set; ///< throws BadValue
+    std::function<void(Config&)> clear{};                       ///< of a list
 };
 
 struct Range {
@@ -83,9 +84,9 @@ template<class... Members> Setting text(Members... members) {
 }
 
 template<class List> Setting list(List Config::*member) {
-    return {Form::list, [=](Config& config, const std::string& value) {
-                (config.*member).emplace_back(notEmpty(value));
-            }};
+    return {Form::list,
+            [=](Config& config, const std::string& value) { (config.*member).emplace_back(notEmpty(value)); },
+            [=](Config& config) { (config.*member).clear(); }};
 }
 
 Setting flag(bool Config::*member) {
@@ -183,18 +184,6 @@ void readConfigFile(Config& config, const std::string& file) {
     }
 }
 
-/// A list on the command line replaces the file's instead of extending it: a host must not listen where the
-/// administrator did not ask it to.
-void forgetLists(Config& config, const std::string& name) {
-    if (name == "listen") {
-        config.listen.clear();
-    } else if (name == "module") {
-        config.modules.clear();
-    } else if (name == "host-name") {
-        config.hostNames.clear();
-    }
-}
-
 void check(const Config& config) {
     if (config.help || config.version) {
         return;
@@ -260,8 +249,12 @@ Config readConfig(const std::vector<std::string>& words) {
             readConfigFile(config, word.value);
         }
     }
+    // A list on the command line replaces the file's instead of extending it: a host must not listen where
+    // the administrator did not ask it to.
     for (const Word& word : given) {
-        forgetLists(config, word.name);
+        if (const Setting* const setting = settingNamed(word.name); setting != nullptr && setting->clear) {
+            setting->clear(config);
+        }
     }
     for (const Word& word : given) {
         const Setting* const setting = settingNamed(word.name);

@@ -94,7 +94,7 @@ bool AccessControl::isAdmin(const Peer& peer) const {
         return true;
     }
     const auto admins = groupNamed(settings_.adminGroup);
-    return admins && std::find(peer.groups.begin(), peer.groups.end(), *admins) != peer.groups.end();
+    return admins && std::ranges::find(peer.groups, *admins) != peer.groups.end();
 }
 
 bool AccessControl::knowsHost(const std::string& host, const Peer& peer) const {
@@ -104,7 +104,7 @@ bool AccessControl::knowsHost(const std::string& host, const Peer& peer) const {
     }
     const auto isName = [&name = name](const std::string& each) { return lowerCase(each) == name; };
     return name == "localhost" || name == "127.0.0.1" || name == "::1" || name == peer.localAddress ||
-           std::any_of(settings_.hostNames.begin(), settings_.hostNames.end(), isName);
+           std::ranges::any_of(settings_.hostNames, isName);
 }
 
 Refusal AccessControl::refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const {

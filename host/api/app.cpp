@@ -18,10 +18,9 @@ namespace {
 using Path = std::vector<std::string>;
 
 bool matches(const Path& path, const Path& pattern) {
-    return std::equal(path.begin(), path.end(), pattern.begin(), pattern.end(),
-                      [](const std::string& segment, const std::string& wanted) {
-                          return wanted == "*" || segment == wanted;
-                      });
+    return std::ranges::equal(path, pattern, [](const std::string& segment, const std::string& wanted) {
+        return wanted == "*" || segment == wanted;
+    });
 }
 
 void finish(const HttpHandler::Done& done, const Call& call, HttpResponse response) {
@@ -59,7 +58,7 @@ App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
 
 void App::addRoutes(const ModuleTable& table) {
     const auto add = [this](std::vector<Route> routes) {
-        std::move(routes.begin(), routes.end(), std::back_inserter(routes_));
+        std::ranges::move(routes, std::back_inserter(routes_));
     };
     add(rows_.routes());
     add(statusRoutes(table));
@@ -77,7 +76,7 @@ std::optional<Refusal> App::checkAccess(const HttpRequest& head, const Peer& pee
 
 bool App::asksForEvents(const HttpRequest& request) const {
     const auto path = pathSegments(request.path());
-    return path && std::any_of(routes_.begin(), routes_.end(), [&](const Route& each) {
+    return path && std::ranges::any_of(routes_, [&](const Route& each) {
                return !each.answer && each.method == request.method && matches(*path, each.path);
            });
 }
