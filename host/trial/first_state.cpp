@@ -23,6 +23,7 @@ namespace velt::host {
 namespace {
 
 constexpr const char* demo = "demo";
+constexpr const char* sharesFile = "etc/velt/shares.json";
 
 /// Without root's rights the FTP daemon knows only the accounts of its own files.
 void makeDemoUser(const std::filesystem::path& place) {
@@ -59,7 +60,7 @@ void makeDemoShare(const std::filesystem::path& place) {
                                         {"path", (place / demo).string()},
                                         {"ftp", true},
                                         {"users", jsonObject({{user.c_str(), "write"}})}}));
-    check(replaceFile("etc/velt/shares.json", toJson(shares) + "\n", 0644));
+    check(replaceFile(sharesFile, toJson(shares) + "\n", 0644));
 }
 
 /// The first port, from this one on, that the service can have.
@@ -98,7 +99,10 @@ void makeSettings() {
 void makeFirstState(const std::filesystem::path& place) {
     check(replaceFile("etc/velt/network.conf",
                       "# A trial: nobody else can connect.\nversion = 1\nloopback_only = 1\n", 0644));
-    makeDemoShare(place);
+    // Written last, the shares show that all of the demo is there. They may have become the user's own since.
+    if (!fileExists(sharesFile)) {
+        makeDemoShare(place);
+    }
     makeSettings();
 }
 

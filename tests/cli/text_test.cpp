@@ -1,5 +1,4 @@
 #include "base/json_text.h"
-#include "base/printable.h"
 #include "cli/http_client.h"
 #include "cli/json_io.h"
 #include "cli/text_table.h"
@@ -11,16 +10,6 @@
 
 using namespace velt::cli;
 using velt::parseJson;
-using velt::printable;
-
-TEST(TextTest, ControlCharactersCannotReachATerminal) {
-    EXPECT_EQ(printable("plain \xC3\xBC"), "plain \xC3\xBC");
-    EXPECT_EQ(printable(std::string("a\x1b]0;x\x07\0b\x7f", 10)), "a\\x1b]0;x\\x07\\x00b\\x7f");
-    EXPECT_EQ(printable("\xC2\x9B"
-                        "31m"),
-              "\\x9b31m");
-    EXPECT_EQ(printable("\xC2\xA0"), "\xC2\xA0");
-}
 
 TEST(TextTest, ControlCharactersAreEscapedInJson) {
     const std::string text = "a\x1b\x7f\xC2\x9B\xC2\xA0";
