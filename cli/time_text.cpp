@@ -1,9 +1,7 @@
 #include "cli/time_text.h"
 
 #include "base/number_text.h"
-
-#include <iomanip>
-#include <sstream>
+#include "base/utc_text.h"
 
 namespace velt::cli {
 
@@ -45,11 +43,7 @@ bool startsWithDate(const std::string& text) {
 } // namespace
 
 std::string utcText(std::time_t time) {
-    std::tm parts{};
-    gmtime_r(&time, &parts);
-    std::ostringstream text;
-    text << std::put_time(&parts, "%Y-%m-%dT%H:%M:%SZ");
-    return text.str();
+    return velt::utcText(std::chrono::system_clock::from_time_t(time), "%Y-%m-%dT%H:%M:%SZ");
 }
 
 std::optional<std::string> parseSince(const std::string& text, std::time_t now) {

@@ -3,7 +3,7 @@
 #include "base/file.h"
 #include "base/json_value.h"
 #include "base/sha256.h"
-#include "host/base/clock.h"
+#include "base/utc_text.h"
 #include "host/base/json.h"
 #include "host/base/random_text.h"
 

@@ -2,8 +2,6 @@
 
 #include "base/number_text.h"
 
-#include <array>
-#include <cstdio>
 #include <ctime>
 
 namespace velt::host {
@@ -11,13 +9,6 @@ namespace velt::host {
 namespace {
 
 using std::chrono::milliseconds;
-
-std::tm brokenDown(TimePoint time) {
-    const std::time_t seconds = std::chrono::system_clock::to_time_t(time);
-    std::tm parts{};
-    gmtime_r(&seconds, &parts);
-    return parts;
-}
 
 /// 500 ms for ".5Z". Accepts "", "Z", and decimals with or without "Z".
 std::optional<milliseconds> parseFraction(std::string_view text) {
@@ -35,16 +26,6 @@ std::optional<milliseconds> parseFraction(std::string_view text) {
 
 } // namespace
 
-std::string timestamp(TimePoint time) {
-    const std::tm parts = brokenDown(time);
-    const auto sinceEpoch = std::chrono::duration_cast<milliseconds>(time.time_since_epoch());
-    std::array<char, 64> text{};
-    const std::size_t length = std::strftime(text.data(), text.size(), "%Y-%m-%dT%H:%M:%S", &parts);
-    std::snprintf(text.data() + length, text.size() - length, ".%03dZ",
-                  static_cast<int>(sinceEpoch.count() % 1000));
-    return text.data();
-}
-
 std::optional<TimePoint> parseTimestamp(const std::string& text) {
     if (const auto seconds = parseNumber(text); seconds && *seconds >= 0 && *seconds < 100'000'000'000) {
         return TimePoint(std::chrono::seconds(*seconds));
@@ -61,13 +42,6 @@ std::optional<TimePoint> parseTimestamp(const std::string& text) {
     const auto fraction = parseFraction(rest);
     return fraction ? std::optional(std::chrono::system_clock::from_time_t(timegm(&parts)) + *fraction)
                     : std::nullopt;
-}
-
-std::string httpDate() {
-    const std::tm parts = brokenDown(std::chrono::system_clock::now());
-    std::array<char, 64> text{};
-    std::strftime(text.data(), text.size(), "%a, %d %b %Y %H:%M:%S GMT", &parts);
-    return text.data();
 }
 
 } // namespace velt::host

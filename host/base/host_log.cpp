@@ -1,7 +1,7 @@
 #include "host/base/host_log.h"
 
 #include "base/printable.h"
-#include "host/base/clock.h"
+#include "base/utc_text.h"
 
 #include <cstdio>
 #include <utility>

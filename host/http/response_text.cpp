@@ -1,6 +1,6 @@
 #include "host/http/response_text.h"
 
-#include "host/base/clock.h"
+#include "base/utc_text.h"
 
 #include <algorithm>
 #include <array>
@@ -22,7 +22,7 @@ void addHeader(std::string& text, const std::string& name, const std::string& va
 
 std::string commonHead(int status) {
     std::string text = "HTTP/1.1 " + std::to_string(status) + " " + reasonPhrase(status) + "\r\n";
-    addHeader(text, "Date", httpDate());
+    addHeader(text, "Date", utcText(std::chrono::system_clock::now(), "%a, %d %b %Y %H:%M:%S GMT"));
     addHeader(text, "Cache-Control", "no-store");
     addHeader(text, "X-Content-Type-Options", "nosniff");
     return text;

@@ -1,6 +1,7 @@
 #include "standalone/journal/event_file.h"
 
 #include "base/file.h"
+#include "base/utc_text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -11,29 +12,13 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstdio>
 #include <cstring>
-#include <ctime>
 
 namespace velt {
 
 namespace {
 
 constexpr std::size_t longestLine = 65536;
-
-/// "2026-11-21T06:30:11.123Z"
-std::string renderTime(std::chrono::system_clock::time_point time) {
-    const auto seconds = std::chrono::floor<std::chrono::seconds>(time);
-    const std::time_t clock = seconds.time_since_epoch().count();
-    std::tm parts{};
-    gmtime_r(&clock, &parts);
-    char date[32];
-    std::strftime(date, sizeof date, "%Y-%m-%dT%H:%M:%S", &parts);
-    char text[48];
-    std::snprintf(text, sizeof text, "%s.%03dZ", date,
-                  static_cast<int>(std::chrono::floor<std::chrono::milliseconds>(time - seconds).count()));
-    return text;
-}
 
 Error cannotWrite(const std::filesystem::path& path, const char* why) {
     return {ErrorNumber::event, "Cannot write the event to " + path.string() + ": " + why + "."};
@@ -88,7 +73,7 @@ std::string renderEvent(const SystemEvent& event) {
         parameters[key] = value;
     }
     Json::Value line(Json::objectValue);
-    line["time"] = renderTime(event.time);
+    line["time"] = timestamp(event.time);
     line["event"] = event.name;
     line["parameters"] = std::move(parameters);
     line["actor"] = event.actor;

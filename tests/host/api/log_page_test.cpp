@@ -124,7 +124,7 @@ TEST_F(HostLogPage, ALogThatCannotBeReadIsAFailure) {
 TEST(Clock, MomentsAreReadInSeveralForms) {
     using velt::host::parseTimestamp;
     const auto read = [](const char* text) {
-        const auto time = parseTimestamp(text).value_or(velt::host::TimePoint::min());
+        const auto time = parseTimestamp(text).value_or(velt::TimePoint::min());
         return std::chrono::duration_cast<std::chrono::milliseconds>(time.time_since_epoch()).count();
     };
     EXPECT_EQ(read("1970-01-02"), 86'400'000);
@@ -134,7 +134,7 @@ TEST(Clock, MomentsAreReadInSeveralForms) {
     for (const char* text : {"", "x", "1970-01-01T00:00", "1970-01-01T00:00:01+01:00", "-1", "1970-13-01"}) {
         EXPECT_FALSE(parseTimestamp(text)) << text;
     }
-    EXPECT_EQ(velt::host::timestamp(velt::host::TimePoint(std::chrono::milliseconds(1'250))),
+    EXPECT_EQ(velt::timestamp(velt::TimePoint(std::chrono::milliseconds(1'250))),
               "1970-01-01T00:00:01.250Z");
 }
 
