@@ -1,8 +1,11 @@
 #include "cli/setting.h"
 
+#include "base/json_value.h"
 #include "base/number_text.h"
+#include "base/printable.h"
 #include "base/text.h"
 #include "cli/failure.h"
+#include "cli/json_io.h"
 #include "schema/setting_text.h"
 
 #include <algorithm>
@@ -158,6 +161,18 @@ Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted,
         change["ext_ip"] = " ";
     }
     return change;
+}
+
+Json::Value changeToJson(const SettingChange& change) {
+    return jsonObject({{"key", change.key}, {"from", change.from}, {"to", change.to}});
+}
+
+std::string changeToText(const SettingChange& change) {
+    const auto shown = [](const Json::Value& value) {
+        const std::string text = displayValue(value);
+        return text.empty() ? std::string("(empty)") : printable(text);
+    };
+    return change.key + ": " + shown(change.from) + " -> " + shown(change.to);
 }
 
 } // namespace velt::cli

@@ -4,7 +4,6 @@
 #include "cli/current_settings.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
-#include "cli/setting_change.h"
 #include "cli/text_table.h"
 #include "schema/setting_text.h"
 

@@ -5,7 +5,6 @@
 #include "base/printable.h"
 #include "base/text.h"
 #include "cli/current_settings.h"
-#include "cli/setting_change.h"
 
 #include <algorithm>
 
