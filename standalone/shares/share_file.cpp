@@ -120,14 +120,6 @@ Result<> checkRoot(const Json::Value& root) {
     return {};
 }
 
-Json::Value grantsValue(const std::map<std::string, Access>& grants) {
-    Json::Value object(Json::objectValue);
-    for (const auto& [account, access] : grants) {
-        object[account] = accessWords.at(static_cast<std::size_t>(access));
-    }
-    return object;
-}
-
 } // namespace
 
 Result<std::vector<ShareEntry>> parseShares(std::string_view text) {
@@ -145,24 +137,6 @@ Result<std::vector<ShareEntry>> parseShares(std::string_view text) {
         return damaged(good.error().message);
     }
     return shares;
-}
-
-std::string renderShares(const std::vector<ShareEntry>& shares) {
-    Json::Value list(Json::arrayValue);
-    for (const ShareEntry& share : shares) {
-        Json::Value object(Json::objectValue);
-        object["name"] = share.name;
-        object["comment"] = share.comment;
-        object["path"] = share.path;
-        object["ftp"] = share.offeredToFtp;
-        object["users"] = grantsValue(share.users);
-        object["groups"] = grantsValue(share.groups);
-        list.append(std::move(object));
-    }
-    Json::Value root(Json::objectValue);
-    root["version"] = formVersion;
-    root["shares"] = std::move(list);
-    return jsonText(root, "  ") + "\n";
 }
 
 } // namespace velt

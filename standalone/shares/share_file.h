@@ -10,13 +10,14 @@
 
 namespace velt {
 
-/// Reads the text of the shares' file: JSON in its strict form, the keys as renderShares writes them, of
-/// which "comment", "ftp", "users" and "groups" may be absent. The error of a damaged one names the file and
-/// what is wrong in it.
+/// Reads the text of the shares' file, JSON in its strict form:
+///
+///     {"version": 1, "shares": [{"name": "music", "comment": "", "path": "/srv/music", "ftp": true,
+///                                "users": {"alice": "write"}, "groups": {"staff": "read"}}]}
+///
+/// All but "name" and "path" of a share may be absent. The error of a damaged text names the file and what is
+/// wrong in it.
 Result<std::vector<ShareEntry>> parseShares(std::string_view text);
-
-/// The text of shares that checkShares has passed.
-std::string renderShares(const std::vector<ShareEntry>& shares);
 
 } // namespace velt
 

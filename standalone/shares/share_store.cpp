@@ -2,10 +2,7 @@
 
 #include "base/file.h"
 #include "base/file_stamp.h"
-#include "standalone/core/effects.h"
-#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
-#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/share_file.h"
 
@@ -50,15 +47,6 @@ Result<std::vector<ShareEntry>> loadShares() {
         known.shares = *shares;
     }
     return shares;
-}
-
-Result<> storeShares(const std::vector<ShareEntry>& shares) {
-    if (const Result<> good = checkShares(shares); !good) {
-        return Error(ErrorNumber::invalid, "Cannot store the shares: " + good.error().message + ".");
-    }
-    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    return perform(Effect::store, "shares",
-                   [&shares] { return replaceFile(statePath(paths::shares), renderShares(shares), 0644); });
 }
 
 } // namespace velt

@@ -8,13 +8,8 @@
 
 namespace velt {
 
-/// The stored shares in their order; none before the first store. Thread-safe.
+/// The stored shares in their order; none without the file. Thread-safe.
 Result<std::vector<ShareEntry>> loadShares();
-
-/// Stores these shares in place of the stored ones; FTP logins follow them from the next one on. To change
-/// what loadShares returned, hold a StateLock from before that call until after this one. An error leaves the
-/// stored shares as they were. Thread-safe.
-Result<> storeShares(const std::vector<ShareEntry>& shares);
 
 } // namespace velt
 

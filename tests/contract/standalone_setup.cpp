@@ -4,9 +4,9 @@
 #include "standalone/contract/last_error.h"
 #include "standalone/contract/string_map.h"
 #include "standalone/core/state_root.h"
-#include "standalone/shares/share_store.h"
 #include "standalone/standalone.h"
 #include "tests/contract/platform_setup.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/temporary_folder.h"
 
 #include <sys/stat.h>
@@ -51,7 +51,7 @@ velt::Result<> prepareShares(const World& world) {
         shares.push_back(
             {share.name, share.comment, folderOf(share.name), share.offeredToFtp, {{"ftp", grant}}, {}});
     }
-    return velt::storeShares(shares);
+    return velt::test::storeShares(shares);
 }
 
 } // namespace

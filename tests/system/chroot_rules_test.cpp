@@ -2,6 +2,7 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/contract/last_error.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 
 #include <sys/stat.h>

@@ -5,6 +5,7 @@
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/process/run_program.h"
 #include "standalone/rules/rule_store.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/system/support/daemon_process.h"

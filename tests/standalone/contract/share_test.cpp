@@ -3,7 +3,7 @@
 #include "platform/share.h"
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/shares/share_store.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
 
@@ -37,7 +37,7 @@ protected:
 };
 
 TEST_F(ShareContractTest, AShareHasItsThreeTexts) {
-    ASSERT_EQ(messageOf(storeShares({{"public", "For all", "/srv/public", true, {}, {}}})), "");
+    ASSERT_EQ(messageOf(test::storeShares({{"public", "For all", "/srv/public", true, {}, {}}})), "");
     VELT_SHARE* share = nullptr;
     ASSERT_EQ(VELTShareGet("public", &share), 0);
     EXPECT_STREQ(share->name, "public");
@@ -48,7 +48,7 @@ TEST_F(ShareContractTest, AShareHasItsThreeTexts) {
 }
 
 TEST_F(ShareContractTest, AnUnknownNameFailsAndLeavesTheHandleAlone) {
-    ASSERT_EQ(messageOf(storeShares({{"public", "", "/srv/public", true, {}, {}}})), "");
+    ASSERT_EQ(messageOf(test::storeShares({{"public", "", "/srv/public", true, {}, {}}})), "");
     for (const char* name : {"PUBLIC", "", "public/", "../public", "publi", "\xff", "a\nb"}) {
         VELT_SHARE* share = nullptr;
         EXPECT_LT(VELTShareGet(name, &share), 0) << name;
@@ -59,10 +59,10 @@ TEST_F(ShareContractTest, AnUnknownNameFailsAndLeavesTheHandleAlone) {
 }
 
 TEST_F(ShareContractTest, ListsWhatIsOfferedToFtpInTheOrderOfTheStore) {
-    ASSERT_EQ(messageOf(storeShares({{"z", "", "/z", true, {}, {}},
-                                     {"hidden", "", "/h", false, {}, {}},
-                                     {"a", "", "/a", true, {}, {}},
-                                     {"m", "", "/m", true, {}, {}}})),
+    ASSERT_EQ(messageOf(test::storeShares({{"z", "", "/z", true, {}, {}},
+                                           {"hidden", "", "/h", false, {}, {}},
+                                           {"a", "", "/a", true, {}, {}},
+                                           {"m", "", "/m", true, {}, {}}})),
               "");
     ASSERT_EQ(VELTFTPShareEnum(&list_, offeredToFtp), 0);
     EXPECT_EQ(listed(), (std::vector<std::string>{"z", "a", "m"}));

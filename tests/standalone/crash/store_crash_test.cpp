@@ -13,7 +13,6 @@
 #include "standalone/control/start_failure.h"
 #include "standalone/journal/event_file.h"
 #include "standalone/settings/settings.h"
-#include "standalone/shares/share_store.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/crash/killed_process.h"
 #include "tests/standalone/support/state_folder.h"
@@ -106,21 +105,6 @@ std::string readRules() {
         text += std::string(VLIBCSzListGet(rules.get(), i)) + "\n";
     }
     return text;
-}
-
-int storeShares(const char* folder) {
-    ShareEntry share;
-    share.name = "public";
-    share.path = folder;
-    share.offeredToFtp = true;
-    share.users["ftp"] = Access::read;
-    const auto stored = velt::storeShares({share});
-    return stored ? 0 : fail(stored.error());
-}
-
-std::string readShares() {
-    const auto shares = loadShares();
-    return shares && shares->size() == 1 ? shares->front().path : unreadable();
 }
 
 int logText(const char* text) {
@@ -217,7 +201,6 @@ const Store stores[] = {
      [] { return VELTFTPDeleteChrootUser(List({"ann"}).get()); }, readRules},
     {"ARunKey", [] { return VLIBServicecfgRunKeySet("ftpd", 1); },
      [] { return VLIBServicecfgRunKeySet("ftpd", 2); }, [] { return fileText("/etc/velt/run-keys/ftpd"); }},
-    {"Shares", [] { return storeShares("/srv/old"); }, [] { return storeShares("/srv/new"); }, readShares},
     {"TheLog", logAnew, [] { return logText("new"); }, readLog},
     {"TheFailureOfAStart", [] { return toContract(noteOutcome(ftpDaemon, {})); },
      [] {

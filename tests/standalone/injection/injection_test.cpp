@@ -8,6 +8,7 @@
 #include "standalone/settings/settings.h"
 #include "standalone/shares/share_store.h"
 #include "tests/standalone/support/state_folder.h"
+#include "tests/standalone/support/store_shares.h"
 
 #include <gtest/gtest.h>
 
@@ -156,6 +157,9 @@ int storeShare(const std::string& name, const std::string& comment, const std::s
     share.comment = comment;
     share.path = path;
     share.users[user] = Access::read;
+    if (const auto good = checkShares({share}); !good) {
+        return fail(good.error().number, "These shares cannot be: " + good.error().message + ".");
+    }
     const auto stored = storeShares({share});
     return stored ? 0 : fail(stored.error());
 }

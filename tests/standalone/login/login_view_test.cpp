@@ -3,7 +3,7 @@
 
 #include "standalone/core/state_root.h"
 #include "standalone/rules/rule_store.h"
-#include "standalone/shares/share_store.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
 

@@ -1,4 +1,5 @@
 #include "standalone/shares/share_file.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/standalone/support/text_breaker.h"
 #include "tests/support/result.h"
 

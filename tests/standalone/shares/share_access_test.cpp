@@ -5,7 +5,7 @@
 #include "standalone/accounts/account_sources.h"
 #include "standalone/core/state_root.h"
 #include "standalone/shares/folder_access.h"
-#include "standalone/shares/share_store.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
 
@@ -219,7 +219,7 @@ TEST_F(ShareAccessTest, TheContractFillsTheThirdWord) {
         {{}, 0}, {{{"ftp", Access::write}}, 1}, {{{"ftp", Access::read}}, 2}, {{{"ftp", Access::none}}, 4}};
     for (const auto& [grants, code] : codes) {
         share_.users = grants;
-        ASSERT_EQ(messageOf(storeShares({share_})), "");
+        ASSERT_EQ(messageOf(test::storeShares({share_})), "");
         VELT_SHARE* share = nullptr;
         ASSERT_EQ(VELTShareGet("public", &share), 0);
         VELT_SHARE_PRIV privilege{{7, 7}, 7};

@@ -1,5 +1,7 @@
 #include "standalone/shares/share_file.h"
 
+#include "standalone/core/error_number.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 
 #include <gtest/gtest.h>
@@ -58,10 +60,10 @@ TEST(ShareFile, ReadsEveryField) {
 TEST(ShareFile, WritesWhatItReads) {
     const auto shares = parseShares(twoShares);
     ASSERT_TRUE(shares);
-    const std::string text = renderShares(*shares);
+    const std::string text = test::renderShares(*shares);
     const auto again = parseShares(text);
     ASSERT_TRUE(again) << messageOf(again);
-    EXPECT_EQ(renderShares(*again), text);
+    EXPECT_EQ(test::renderShares(*again), text);
     EXPECT_NE(text.find("Bücher"), std::string::npos) << "a person reads this file";
     EXPECT_EQ((*again)[0].users, (*shares)[0].users);
 }
@@ -75,7 +77,7 @@ TEST(ShareFile, KeepsOddButAllowedTextAsItIs) {
         share.path = "/srv/" + name;
         share.users["u" + name.substr(0, 200)] = Access::read;
         ASSERT_TRUE(checkShares({share})) << name;
-        const auto read = parseShares(renderShares({share}));
+        const auto read = parseShares(test::renderShares({share}));
         ASSERT_TRUE(read) << messageOf(read);
         EXPECT_EQ((*read)[0].name, share.name);
         EXPECT_EQ((*read)[0].comment, share.comment);
@@ -115,6 +117,16 @@ TEST(ShareFile, NamesTheFlawOfADamagedShare) {
     for (const auto& [share, flaw] : cases) {
         EXPECT_EQ(flawIn(withShare(share)), flaw);
     }
+}
+
+TEST(ShareFile, NamesTheShareThatCannotBe) {
+    const auto shares =
+        checkShares({{"good", "", "/srv/good", false, {}, {}}, {"a/b", "", "/srv/b", false, {}, {}}});
+    ASSERT_FALSE(shares);
+    EXPECT_EQ(shares.error().number, ErrorNumber::invalid);
+    EXPECT_TRUE(messageOf(shares).starts_with("share 2, \"name\": expected 1 to 255 bytes"))
+        << messageOf(shares);
+    EXPECT_FALSE(checkShares({{"a", "", "/a", false, {}, {}}, {"a", "", "/b", false, {}, {}}}));
 }
 
 TEST(ShareFile, IsStrictJson) {

@@ -2,9 +2,10 @@
 
 #include "platform/core.h"
 #include "standalone/contract/last_error.h"
-#include "standalone/core/effects.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
 
@@ -31,19 +32,18 @@ protected:
         setStateRoot(folder_.path());
         clearLastError();
     }
-    ~ShareStoreTest() override { setEffectHook({}); }
 
     test::TemporaryFolder folder_;
 };
 
-TEST_F(ShareStoreTest, HasNoSharesBeforeTheFirstStore) {
+TEST_F(ShareStoreTest, HasNoSharesWithoutTheFile) {
     const auto shares = loadShares();
     ASSERT_TRUE(shares);
     EXPECT_TRUE(shares->empty());
 }
 
-TEST_F(ShareStoreTest, GivesBackWhatWasStoredInItsOrder) {
-    ASSERT_EQ(messageOf(storeShares({shareCalled("zebra"), shareCalled("alpha")})), "");
+TEST_F(ShareStoreTest, GivesTheFileInItsOrder) {
+    ASSERT_EQ(messageOf(test::storeShares({shareCalled("zebra"), shareCalled("alpha")})), "");
     const auto shares = loadShares();
     ASSERT_TRUE(shares);
     ASSERT_EQ(shares->size(), 2U);
@@ -51,25 +51,13 @@ TEST_F(ShareStoreTest, GivesBackWhatWasStoredInItsOrder) {
     EXPECT_EQ((*shares)[1].name, "alpha");
 }
 
-TEST_F(ShareStoreTest, SeesEachStoreAtOnce) {
+TEST_F(ShareStoreTest, SeesEachChangeAtOnce) {
     for (int round = 0; round < 30; ++round) {
         ShareEntry share = shareCalled("a");
         share.users["ftp"] = round % 2 == 0 ? Access::none : Access::read;
-        ASSERT_EQ(messageOf(storeShares({share})), "");
+        ASSERT_EQ(messageOf(test::storeShares({share})), "");
         ASSERT_EQ(loadShares()->at(0).users.at("ftp"), share.users.at("ftp")) << round;
     }
-}
-
-TEST_F(ShareStoreTest, AFlawedShareIsNotStored) {
-    ASSERT_EQ(messageOf(storeShares({shareCalled("good")})), "");
-    const std::string before = folder_.read("/etc/velt/shares.json");
-    const auto refused = storeShares({shareCalled("good"), shareCalled("a/b")});
-    ASSERT_FALSE(refused);
-    EXPECT_EQ(refused.error().number, ErrorNumber::invalid);
-    EXPECT_NE(refused.error().message.find("share 2, \"name\": expected 1 to 255 bytes"), std::string::npos)
-        << messageOf(refused);
-    EXPECT_FALSE(storeShares({shareCalled("twice"), shareCalled("twice")}));
-    EXPECT_EQ(folder_.read("/etc/velt/shares.json"), before);
 }
 
 TEST_F(ShareStoreTest, ADamagedFileIsAnErrorThatNamesIt) {
@@ -89,18 +77,6 @@ TEST_F(ShareStoreTest, AFileThatCannotBeReadIsAnError) {
     EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::store));
 }
 
-TEST_F(ShareStoreTest, AStoreThatIsRefusedLeavesTheFile) {
-    ASSERT_EQ(messageOf(storeShares({shareCalled("old")})), "");
-    std::string seen;
-    setEffectHook([&seen](Effect effect, std::string_view subject) {
-        seen = std::string(effectName(effect)) + " " + std::string(subject);
-        return EffectDecision(Error("Refused."));
-    });
-    EXPECT_EQ(messageOf(storeShares({shareCalled("new")})), "Refused.");
-    EXPECT_EQ(seen, "store shares");
-    EXPECT_EQ(loadShares()->at(0).name, "old");
-}
-
 TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
     constexpr int each = 20;
     const auto addAll = [](const std::string& prefix) {
@@ -111,7 +87,7 @@ TEST_F(ShareStoreTest, TwoProcessesThatAddSharesLoseNone) {
                 return 1;
             }
             shares->push_back(shareCalled(prefix + std::to_string(i)));
-            if (!storeShares(*shares)) {
+            if (!test::storeShares(*shares)) {
                 return 2;
             }
         }

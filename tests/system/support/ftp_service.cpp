@@ -3,6 +3,7 @@
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 
 #include <sys/stat.h>
@@ -46,7 +47,7 @@ fs::path FtpService::addShare(const std::string& name, const std::string& folder
     share.users = {
         {"ftp", anonymous}, {"alice", Access::write}, {"bob", Access::write}, {"carol", Access::write}};
     shares_.push_back(share);
-    EXPECT_EQ(messageOf(velt::storeShares(shares_)), "");
+    EXPECT_EQ(messageOf(storeShares(shares_)), "");
     return path;
 }
 

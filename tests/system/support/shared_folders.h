@@ -5,6 +5,7 @@
 #include "tests/system/support/ftp_service.h"
 
 #include "standalone/contract/last_error.h"
+#include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 
 #include <sys/stat.h>
@@ -43,7 +44,7 @@ protected:
     ShareEntry& entry(const std::string& name) {
         return *std::ranges::find(shares_, name, &ShareEntry::name);
     }
-    void store() { EXPECT_EQ(messageOf(velt::storeShares(shares_)), ""); }
+    void store() { EXPECT_EQ(messageOf(storeShares(shares_)), ""); }
 
     /// The names that a session of the user's sees in the folder, sorted; "530" when the login is refused.
     static std::string seenBy(const std::string& user, const std::string& folder = "/") {
