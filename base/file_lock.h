@@ -1,4 +1,4 @@
-// Waiting for the lock of a file, though not for ever.
+// Waiting for the lock of a file, with a limit.
 #ifndef VELT_BASE_FILE_LOCK_H
 #define VELT_BASE_FILE_LOCK_H
 

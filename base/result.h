@@ -12,7 +12,7 @@ namespace velt {
 /// The kind of an error. Each program names its own; 0 is an error whose message says all there is to know.
 enum class ErrorNumber : int;
 
-/// A place in the source. (std::source_location is not there with every compiler that builds this.)
+/// A place in the source. (Not every compiler that builds this has std::source_location.)
 struct SourcePlace {
     const char* file = "";
     int line = 0;
@@ -35,15 +35,15 @@ struct Error {
         : Error(ErrorNumber{}, std::move(sentence), place) {}
 };
 
-/// A value, or the Error that kept it from being made. What can fail and gives nothing returns a Result<>. A
-/// value that is not there may not be asked for, nor an error.
+/// A value, or the Error that says why there is no value. An operation that can fail but has no value to give
+/// returns a Result<>. Ask for the value only after a success, and for the error only after a failure.
 ///
 ///     VELT_ASSIGN_OR_RETURN(const std::string text, readFile(path));
 template<class Value = void> class [[nodiscard]] Result {
 public:
     Result(Value value) : outcome_(std::move(value)) {}
     Result(Error error) : outcome_(std::move(error)) {}
-    /// From what a value can be made of, such as std::nullopt or a literal.
+    /// From anything that converts to the value, such as std::nullopt or a literal.
     template<class From>
     requires std::is_convertible_v<From, Value> &&(!std::is_same_v<std::remove_cvref_t<From>, Value>)&&(
         !std::is_same_v<std::remove_cvref_t<From>, Error>)Result(From&& value)

@@ -12,7 +12,7 @@ inline constexpr std::string_view blanks = " \t\r";
 /// The text without the blanks at its ends.
 std::string_view trimmed(std::string_view text);
 
-/// The text without those of the characters that it ends in.
+/// The text without any of these characters at its end.
 std::string_view trimmedEnd(std::string_view text, std::string_view characters);
 
 /// Whether the byte is a control character of ASCII.
@@ -20,7 +20,7 @@ constexpr bool isControl(char byte) {
     return static_cast<unsigned char>(byte) < 0x20 || byte == 0x7f;
 }
 
-/// The text with the letters A to Z as small ones.
+/// The text with the letters A to Z in lower case.
 std::string lowerCase(std::string_view text);
 
 /// Two digits for each byte: "0aff".

@@ -7,8 +7,6 @@ namespace velt::schema {
 namespace {
 
 std::string rangeFacts(const Setting& setting) {
-    if (setting.least == lowestNumber && setting.most == highestNumber)
-        return "any number";
     const std::string unit = setting.unit == nullptr ? "" : std::string(setting.unit) + ", ";
     return unit + std::to_string(setting.least) + " to " + std::to_string(setting.most);
 }

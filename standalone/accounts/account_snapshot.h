@@ -33,7 +33,7 @@ private:
 
 struct UserSnapshot {
     UserTable people;         ///< the local ones, then `remote` without those whose name is a local one
-    UserTable systemAccounts; ///< local accounts that are no people
+    UserTable systemAccounts; ///< local accounts that do not belong to people
 
     static std::shared_ptr<const UserSnapshot> make(std::vector<UserEntry> local,
                                                     const std::vector<UserEntry>& remote, UidRange range);

@@ -14,7 +14,7 @@ struct AccountSources {
     std::filesystem::path loginDefs = "/etc/login.defs";
     std::filesystem::path nsswitch = "/etc/nsswitch.conf";
     std::filesystem::path moduleFolder; ///< of libnss_*.so.2; empty: where the dynamic linker looks
-    /// How long a listing of the domain and LDAP sources is taken as current; they tell of no changes.
+    /// How long a listing of the domain and LDAP sources is taken as current; they do not report changes.
     std::chrono::seconds remoteLifetime{30};
 };
 

@@ -25,7 +25,8 @@ public:
     NameService(const NameService&) = delete;
     NameService& operator=(const NameService&) = delete;
 
-    /// Every user that the source tells of. Many sources are set up to tell of none, though each can log in.
+    /// Every user that the source lists. Many sources are set up to list nobody, though their users can log
+    /// in.
     std::vector<UserEntry> users() const;
 
     std::optional<UserEntry> userByName(const std::string& name) const;

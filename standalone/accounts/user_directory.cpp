@@ -35,8 +35,8 @@ constexpr std::array<ModuleName, 3> moduleNames{{
 using Modules = std::vector<std::shared_ptr<const NameService>>;
 
 /// What is known of the accounts, and when it was learned. Files are read under the lock, so that a change of
-/// a large one is read once, whoever asks. A domain may take long to answer or not answer at all: it is asked
-/// outside of the lock, by one thread at a time, and the others go on with what it said before.
+/// a large one is read once for all threads. A domain may take long to answer or not answer at all: it is
+/// asked outside of the lock, by one thread at a time, and the others use what it said before.
 class Directory {
 public:
     void setSources(AccountSources sources);

@@ -39,8 +39,8 @@ struct GroupEntry {
 
 /// All people who have an account: the local ones from UID_MIN to UID_MAX of login.defs in the order of the
 /// password file, then those of the domain, then those of LDAP, as far as these sources tell. "nobody" and
-/// system accounts are no people. Never null. A domain or LDAP source is asked again after half a minute; a
-/// change of the local files shows at once. Thread-safe, as everything here.
+/// system accounts do not count as people. Never null. A domain or LDAP source is asked again after half a
+/// minute; a change of the local files shows at once. Thread-safe, as everything here.
 std::shared_ptr<const std::vector<UserEntry>> allUsers();
 
 /// Any account, system accounts included. A name or number that more than one source knows is the local one.
@@ -49,7 +49,7 @@ std::optional<UserEntry> userById(uid_t uid);
 std::optional<GroupEntry> groupByName(const std::string& name);
 std::optional<GroupEntry> groupById(gid_t gid);
 
-/// As userByName and groupByName; that there is none is an error.
+/// As userByName and groupByName; a missing account is an error.
 Result<UserEntry> findUser(const std::string& name);
 Result<GroupEntry> findGroup(const std::string& name);
 

@@ -22,8 +22,8 @@ inline int toContract(const Result<int>& result) {
 }
 
 /// Calls `operation` and returns its int, or that of its Result: 0 or the value, -1 with the last error set.
-/// An exception does not leave it: the result is then -1, with the last error set. The body of a contract
-/// function that can throw, allocation included, stands in it.
+/// An exception does not leave it: the result is then -1, with the last error set. A contract function
+/// that can throw, even by allocating, has its body in here.
 template<class Operation> int atBoundary(Operation&& operation) noexcept {
     try {
         return toContract(std::forward<Operation>(operation)());

@@ -112,7 +112,7 @@ int VLIBCFileGetKeyValue(const char* path, const char* key, char* value, int siz
             return velt::fail(found.error());
         if (!*found)
             return 0;
-        // A NUL byte in the file ends the value for every reader of C strings; so it does here.
+        // A NUL byte in the file ends the value, as it does for everybody who reads C strings.
         const std::string& text = **found;
         const auto length = std::min({text.size(), text.find('\0'), static_cast<std::size_t>(size - 1)});
         std::memcpy(value, text.data(), length);
@@ -125,7 +125,7 @@ int VLIBCINFOSetKeyValue(const char* key, const char* value) {
     if (key == nullptr || value == nullptr)
         return velt::fail(velt::ErrorNumber::invalid, "A key and a value are required.");
     return velt::atBoundary([&]() -> int {
-        // A blank stands for no address: whoever may not write an empty text can still take the address away.
+        // A blank means no address, for callers that cannot pass an empty text.
         if (key == velt::externalAddressKey)
             return velt::toContract(velt::changeExternalAddress(velt::isBlank(value) ? "" : value));
         return velt::toContract(velt::writeSystemInformation(key, value));

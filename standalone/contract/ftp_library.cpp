@@ -44,18 +44,18 @@ Result<> storeRecord(const _tag_VELT_FTP_CONF_& record) {
     VELT_RETURN_IF_ERROR(changeFtpSettings([&record](FtpSettings& settings) {
         settings.record = lastSeenRecord().merge(settings.record, record);
     }));
-    // Not what was stored in the end: the caller goes on with its own copy.
+    // Not what was stored: the caller continues with its own copy.
     lastSeenRecord().note(record);
     return {};
 }
 
-int noPlaceFor(const char* what) {
-    return fail(ErrorNumber::invalid, std::string("There is no place for ") + what + ".");
+int missing(const char* what) {
+    return fail(ErrorNumber::invalid, std::string(what) + " is required.");
 }
 
 int pushAll(VLIBCSzList** list, const Result<std::vector<std::string>>& texts) {
     if (list == nullptr || *list == nullptr)
-        return noPlaceFor("the names");
+        return missing("A list for the names");
     if (!texts)
         return fail(texts.error());
     for (const std::string& text : *texts)
@@ -145,7 +145,7 @@ Result<> writeRule(char* buffer, int size, bool isUser, int id, const char* path
 
 int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out) {
     if (out == nullptr)
-        return velt::noPlaceFor("the FTP settings");
+        return velt::missing("A record for the FTP settings");
     return velt::atBoundary([out] { return velt::readRecord(*out); });
 }
 
@@ -195,7 +195,7 @@ int VELTFTPUmaskEnabledSet(bool enable) {
 
 int VELTFTPDefaultPassivePortGet(VELT_FTP_PORT_RANGE* out) {
     if (out == nullptr)
-        return velt::noPlaceFor("the default passive range");
+        return velt::missing("A record for the default passive range");
     *out = velt::defaultPassiveRange;
     return 0;
 }

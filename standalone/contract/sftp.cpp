@@ -27,7 +27,7 @@ Result<> readRecord(_tag_VELT_SFTP_CONFIG_& record) {
 Result<> storeSettings(const SftpSettings& wanted) {
     VELT_RETURN_IF_ERROR(changeSftpSettings(
         [&wanted](SftpSettings& settings) { settings = lastSeenSettings().merge(settings, wanted); }));
-    // Not what was stored in the end: the caller goes on with its own copy.
+    // Not what was stored: the caller continues with its own copy.
     lastSeenSettings().note(wanted);
     return {};
 }
@@ -38,7 +38,8 @@ Result<> storeSettings(const SftpSettings& wanted) {
 
 int VELTSFTPConfigGet(int which, _tag_VELT_SFTP_CONFIG_* out) {
     if (which != 1 || out == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid, "There is no such SFTP record, or no place for it.");
+        return velt::fail(velt::ErrorNumber::invalid,
+                          "The SFTP settings are record 1; a place for them is required.");
     return velt::atBoundary([out] { return velt::readRecord(*out); });
 }
 

@@ -13,12 +13,12 @@ namespace velt {
 /// A port that a service cannot have.
 struct PortConflict {
     int port = 0;
-    std::string holder; ///< in words: "the SFTP service", "nginx (process 812)"; "" when the number is wrong
+    std::string holder;   ///< in words: "the SFTP service", "nginx (process 812)"; "" when it is not a port
     std::string sentence; ///< for people
 };
 
 /// The first of these ports that the service ("ftp", "ssh", or another's name) cannot have; nothing when it
-/// can have them all. Fails when that cannot be told, which is no permission to take them. Thread-safe.
+/// can have them all. Fails when that cannot be told; the ports must not be taken then. Thread-safe.
 Result<std::optional<PortConflict>> findPortConflict(std::string_view service, int firstPort, int lastPort);
 
 } // namespace velt

@@ -21,7 +21,7 @@ Result<> followSettings(const Daemon& daemon) {
                               : stop(daemon);
 }
 
-/// Does it with each daemon, whatever becomes of the others, and returns the first failure.
+/// Does it with each daemon, even after a failure with another one, and returns the first failure.
 Result<> forEachDaemon(Result<> (*act)(const Daemon&)) {
     Result<> outcome;
     for (const Daemon* daemon : allDaemons()) {

@@ -80,7 +80,7 @@ Result<> SupervisedDaemon::handOver(const std::filesystem::path& folder, const P
     if (!*answer) {
         return *answer;
     }
-    // The daemon serves; that it would not come back as it is now is no failure of its start.
+    // The daemon serves: its start did not fail, even if it would come back with former settings.
     if (const auto kept = launcher_->keep(folder, order); !kept) {
         ::syslog(LOG_ERR, "%s would come back with its former settings: %s", titleOf(daemon_).c_str(),
                  kept.error().message.c_str());

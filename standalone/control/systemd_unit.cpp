@@ -54,7 +54,7 @@ std::string renderUnit(const Daemon& daemon, const std::filesystem::path& folder
          << "KillMode=process\n"
          << "TimeoutStartSec=10s\n"
          << "TimeoutStopSec=5s\n"
-         // One session too large for the machine's memory is no reason to end the others.
+         // A session too large for the machine's memory must not end the others.
          << "OOMPolicy=continue\n";
     return text.str();
 }

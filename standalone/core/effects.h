@@ -1,5 +1,5 @@
 // Every effect of the platform passes here, under a name, so that it can be listed, timed, refused, or failed
-// by a test. What was done is reported; undoing it is up to whoever listened.
+// by a test. What was done is reported; undoing it is up to the listener.
 #ifndef VELT_STANDALONE_CORE_EFFECTS_H
 #define VELT_STANDALONE_CORE_EFFECTS_H
 

@@ -7,8 +7,7 @@
 namespace velt {
 namespace {
 
-// The library's own place leads to the others, so that an installation works below whatever prefix it was
-// made.
+// The library's own place leads to the others, so that an installation works below any prefix.
 std::filesystem::path libraryFolder() {
     Dl_info library{};
     const auto* here = reinterpret_cast<const void*>(&installedFile);
@@ -31,7 +30,7 @@ std::filesystem::path installedFile(std::string_view name) {
     if (folder != nullptr && *folder != '\0') {
         return std::filesystem::path(folder) / name;
     }
-    // Found out once: a program may change its working folder.
+    // Looked up once, since a program may change its working folder.
     static const std::filesystem::path installed = installedFolder();
     return installed / name;
 }

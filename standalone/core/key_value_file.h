@@ -1,7 +1,7 @@
 // Text files of key=value lines, as other programs of the server keep them.
 //
 // A line is a comment ("# ..."), blank, or "key=value" with blanks around either part left out; a value may
-// stand in double quotes. Where a key stands twice, the last line counts. Any other line is somebody else's
+// be in double quotes. Of two lines with the same key the last one counts. Any other line is somebody else's
 // and is left alone.
 #ifndef VELT_STANDALONE_CORE_KEY_VALUE_FILE_H
 #define VELT_STANDALONE_CORE_KEY_VALUE_FILE_H

@@ -9,7 +9,8 @@
 
 namespace velt {
 
-/// A folder below the state root that goes with this object. It may hold keys: only its owner can enter.
+/// A folder below the state root that is removed with this object. It may hold keys: only its owner can
+/// enter.
 class ScratchFolder {
 public:
     static Result<ScratchFolder> make();

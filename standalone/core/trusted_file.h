@@ -9,8 +9,8 @@
 
 namespace velt {
 
-/// The whole file. It must be a regular file of at most 16 MiB that belongs to root, or to whom this process
-/// belongs, and that nobody else may write. A missing one is an error.
+/// The whole file. It must be a regular file of at most 16 MiB that belongs to root or to this process's
+/// user, and that nobody else may write. A missing one is an error.
 Result<std::string> readTrusted(const std::filesystem::path& path);
 
 } // namespace velt

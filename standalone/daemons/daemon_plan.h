@@ -14,7 +14,7 @@ struct DaemonPlan {
 };
 
 /// Removes what former configurations left beside the folder of this one. To be called when its daemon
-/// serves, since before that the former one may be wanted again.
+/// serves: until then the former one may be needed again.
 void removeFormerPlans(const DaemonPlan& plan);
 
 } // namespace velt

@@ -58,7 +58,7 @@ void warnOfForeignTables() {
                 "services may stay closed.\n";
     }
     ::syslog(LOG_WARNING, "%s", firstLine(text).c_str());
-    // The rules are in force by now: a note that cannot be left is no reason to call them failed.
+    // The rules are in force by now; only the note is missing.
     if (const auto noted = replaceFile(warningFile(), text, 0644); !noted) {
         ::syslog(LOG_WARNING, "%s", noted.error().message.c_str());
     }

@@ -25,7 +25,7 @@ std::string renderOpenPorts(const std::vector<VELT_FTP_PORT_RANGE>& ranges) {
 } // namespace
 
 std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& ports) {
-    // To add a table that is there already is no error, to delete one that is not would be.
+    // Adding a table that exists succeeds, deleting one that does not fails.
     std::string text = "add table inet velt_fileserv\n"
                        "delete table inet velt_fileserv\n";
     if (settings.mode == FirewallMode::off) {

@@ -7,7 +7,7 @@
 
 namespace velt {
 
-/// The number of the rules in force in this process's network: each change, whoever makes it, raises it by
+/// The number of the rules in force in this process's network: each change, by any program, raises it by
 /// one. Nothing when the kernel does not tell, as it does not without the right to change the rules.
 /// Thread-safe.
 std::optional<std::uint32_t> rulesetGeneration();

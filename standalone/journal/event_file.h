@@ -11,7 +11,7 @@
 
 namespace velt {
 
-/// The event as one JSON object in one line of ASCII, without the line's end. Bytes that are no UTF-8 become
+/// The event as one JSON object in one line of ASCII, without the line's end. Bytes that are not UTF-8 become
 /// U+FFFD.
 std::string renderEvent(const SystemEvent& event);
 

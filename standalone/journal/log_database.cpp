@@ -17,7 +17,7 @@ namespace {
 
 constexpr int busyMilliseconds = 5000;
 
-// The number of this table's form, kept in the database itself.
+// The version of this table, kept in the database itself.
 constexpr std::int64_t formVersion = 1;
 
 constexpr const char* tableSql = R"(

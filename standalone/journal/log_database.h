@@ -31,7 +31,7 @@ public:
     /// the same file be opened again beside it, since SQLite takes the parent's locks for its own.
     bool isOwn() const;
 
-    /// Whether this is a connection to the file that stands at `path` now.
+    /// Whether this is a connection to the file that `path` names now.
     bool leadsTo(const std::filesystem::path& path) const;
 
     /// Adds the entry, whose id it sets, and removes what `retention` (when given) no longer keeps, together

@@ -23,7 +23,7 @@ struct LogEntry {
     std::string address;
 };
 
-/// Which entries of the administrator log are wanted; what is not set does not narrow.
+/// Which entries of the administrator log are wanted; a field that is not set excludes nothing.
 struct LogFilter {
     std::optional<std::chrono::system_clock::time_point> since; ///< of this moment or later
     std::optional<unsigned> event;

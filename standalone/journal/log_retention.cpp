@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-// Beyond these a value is a slip, not a wish.
+// A larger value is a typing error.
 constexpr std::int64_t mostEntries = 100'000'000;
 constexpr std::int64_t mostDays = 36'500;
 

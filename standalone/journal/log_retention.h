@@ -9,8 +9,8 @@
 namespace velt {
 
 struct LogRetention {
-    std::int64_t maxEntries = 100'000; ///< 0: any number
-    std::int64_t maxAgeDays = 365;     ///< 0: for ever
+    std::int64_t maxEntries = 100'000; ///< 0: no limit
+    std::int64_t maxAgeDays = 365;     ///< 0: no limit
 };
 
 /// What the configuration file says: lines "max_entries = 100000" and "max_age_days = 365". What is not set

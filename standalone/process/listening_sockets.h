@@ -29,7 +29,7 @@ struct SocketOwner {
     std::string program;
 };
 
-/// The owners of these sockets, by inode. Sockets without an owner that may be seen are missing. Of several
+/// The owners of these sockets, by inode. Sockets whose owner cannot be seen are missing. Of several
 /// processes that share a socket the one with the smallest pid counts.
 std::map<unsigned long, SocketOwner> ownersOf(const std::vector<ListeningSocket>& sockets);
 

@@ -30,7 +30,7 @@ std::optional<ProcessStat> readStat(pid_t pid) {
     if (!std::getline(file, line)) {
         return std::nullopt;
     }
-    // The program's name stands in parentheses and may itself contain blanks and parentheses.
+    // The program's name is in parentheses and may itself contain blanks and parentheses.
     const auto nameEnd = line.rfind(')');
     if (nameEnd == std::string::npos) {
         return std::nullopt;
@@ -123,7 +123,7 @@ void signalProcess(const ProcessId& process, int signal) {
     if (!process) {
         return;
     }
-    // The descriptor stands for one process for ever. What is compared after it was opened is therefore what
+    // The descriptor always means the same process. What is compared after it was opened is therefore what
     // the signal reaches, even when the pid changes hands meanwhile.
     const UniqueFd descriptor(static_cast<int>(::syscall(SYS_pidfd_open, process.pid, 0)));
     if (descriptor && isAlive(process)) {

@@ -28,8 +28,8 @@ using Clock = std::chrono::steady_clock;
 
 constexpr std::size_t mostOutput = std::size_t{1} << 20;
 
-// The input stands in a file in memory: nobody has to feed a pipe while reading two others, and a program
-// that opens /dev/stdin can do so.
+// The input is a file in memory: nobody has to feed a pipe while reading two others, and the program can open
+// /dev/stdin.
 UniqueFd makeInput(std::string_view input) {
     UniqueFd file(::memfd_create("input", MFD_CLOEXEC));
     if (file && (!writeAll(file.get(), input) || ::lseek(file.get(), 0, SEEK_SET) != 0))
@@ -56,7 +56,7 @@ Result<pid_t> spawn(const std::vector<std::string>& arguments, const std::array<
     return program.start(arguments);
 }
 
-// Takes what stands in the pipe now. Past the limit it is read all the same, so that the writer does not
+// Takes what is in the pipe now. Past the limit it is still read, but dropped, so that the writer does not
 // stall.
 void drain(UniqueFd& pipe, std::string& text) {
     std::array<char, 65536> block{};

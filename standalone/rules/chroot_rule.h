@@ -21,7 +21,7 @@ struct ChrootRule {
     bool operator==(const ChrootRule&) const = default;
 };
 
-/// The folder that stands for each user's own home.
+/// The path that means each user's own home.
 inline constexpr std::string_view homePath = "/home";
 
 /// The longest line of a rule, in bytes.
@@ -40,7 +40,7 @@ std::string formatRule(const ChrootRule& rule);
 /// Reads what formatRule makes, and nothing else. The error's message is a part of a sentence.
 Result<ChrootRule> parseRule(std::string_view line);
 
-/// The name of the user or group that the rule is for. An error when nobody has the number.
+/// The name of the user or group that the rule is for. An error when no account has the number.
 Result<std::string> ownerOf(const ChrootRule& rule);
 
 /// The rule that a login follows: the user's first one, else the first one of a group with these numbers.

@@ -20,7 +20,7 @@ Result<std::vector<std::string>> chrootUsers(const UserFilter& filter);
 Result<std::vector<std::string>> otherUsers(const UserFilter& filter);
 
 /// Gives each of these users a rule for the home, in place of any other rule of the user. A name may come
-/// twice. Nothing changes when there is no user of one of the names.
+/// twice. Nothing changes when one of the names is unknown.
 Result<> addChrootUsers(const std::vector<std::string>& names);
 
 /// Takes the rule for the home from each of these users; their other rules stay. As above otherwise.

@@ -34,11 +34,11 @@ inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
 FtpSettings defaultFtpSettings();
 SftpSettings defaultSftpSettings();
 
-/// Writes the default settings into the files that are not there yet; leaves the others alone, whatever they
-/// hold.
+/// Writes the default settings into the files that are not there yet; leaves the others alone, even damaged
+/// ones.
 Result<> writeMissingSettings();
 
-/// The control port of the record; 0 when its text is no decimal number of 1 to 65535.
+/// The control port of the record; 0 when its text is not a number from 1 to 65535.
 int controlPort(const _tag_VELT_FTP_CONF_& record);
 
 /// Whether the record enables FTP or FTPS.

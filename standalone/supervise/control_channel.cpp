@@ -160,7 +160,7 @@ Result<ControlListener> ControlListener::open(const std::filesystem::path& folde
     const SocketAddress address(folder, daemon);
     ::unlink(address.path());
     ControlListener listener(folder, daemon);
-    // The umask of a supervisor lets only its own user through; who speaks is checked all the same.
+    // The supervisor's umask keeps other users out; the peer is checked in any case.
     if (::bind(listener.descriptor(), address.get(), SocketAddress::size()) != 0 ||
         ::chmod(address.path(), S_IRUSR | S_IWUSR) != 0 || ::listen(listener.descriptor(), 8) != 0) {
         return Error("cannot make the control socket in " + folder.string() + ": " + std::strerror(errno));

@@ -24,7 +24,7 @@ void tellServiceManager(const std::string& assignments) {
     }
     address.sun_family = AF_UNIX;
     path.copy(address.sun_path, path.size());
-    if (path.front() == '@') { // an address that is no file
+    if (path.front() == '@') { // an abstract address, not a file
         address.sun_path[0] = '\0';
     }
     const auto size = static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + path.size());

@@ -23,7 +23,7 @@ namespace {
 
 using std::chrono::milliseconds;
 
-// A caller waits five seconds for a start; what it must do besides needs a little of that.
+// A caller waits five seconds for a start, and needs a little of that for itself.
 constexpr milliseconds startLimit{4700};
 constexpr milliseconds shortestBackOff{100};
 constexpr milliseconds longestBackOff{30000};

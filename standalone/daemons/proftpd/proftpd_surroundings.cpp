@@ -27,7 +27,7 @@ bool hasIPv6() {
     return socket && bind(socket.get(), reinterpret_cast<const sockaddr*>(&any), sizeof any) == 0;
 }
 
-// The daemon would grant the login all the same, under an account of its own choice.
+// The daemon would still grant the login, under an account of its own choice.
 Result<> checkAnonymousAccount(const FtpSettings& settings) {
     if (settings.record.anonymous == 0) {
         return {};

@@ -18,8 +18,8 @@ struct HostKeys {
 };
 
 /// The host keys below "/var/lib/velt/ssh" of the state root; a missing one is made. Where the thread's hook
-/// leaves the store of them undone, throw-away ones that are gone with the result. They are not those of an
-/// SSH service that the server may run besides. Thread-safe.
+/// leaves the store of them undone, throw-away ones that are gone with the result. They are not the keys of
+/// another SSH service on this server. Thread-safe.
 Result<HostKeys> hostKeys();
 
 } // namespace velt

@@ -22,7 +22,7 @@ struct Pair {
     std::filesystem::path key;
 };
 
-// A key that asks for a passphrase is one that a daemon cannot load; nobody sits there to be asked.
+// A key that asks for a passphrase is one that a daemon cannot load; there is nobody to ask.
 int noPassphrase(char*, int, int, void*) {
     return -1;
 }
@@ -74,8 +74,8 @@ Result<ServerCertificate> load(const Pair& pair) {
                              sha256(*certificateText + *keyText), nullptr};
 }
 
-// A crash between the two writes of a renewal leaves an old certificate with a new key; that is made good
-// here too.
+// A crash between the two writes of a renewal leaves an old certificate with a new key, which is not usable
+// either.
 bool isUsable(const Pair& pair) {
     const auto certificateText = readFile(pair.certificate);
     const auto keyText = readFile(pair.key);

@@ -9,7 +9,7 @@
 
 namespace velt {
 
-/// What a certificate stands for: the host's name and its addresses, as text.
+/// What a certificate is for: the host's name and its addresses, as text.
 struct CertificateNames {
     std::string hostName;
     std::vector<std::string> addresses; ///< IPv4 and IPv6; others are left out

@@ -237,7 +237,7 @@ TEST_F(FtpContract, ADamagedFileFailsEveryOperationAndIsNotOverwritten) {
 TEST_F(FtpContract, WithoutAPlaceForTheAnswerItFails) {
     EXPECT_LT(VELTFTPConfGet(nullptr), 0);
     EXPECT_LT(VELTFTPDefaultPassivePortGet(nullptr), 0);
-    EXPECT_EQ(lastErrorSentence(), "There is no place for the default passive range.");
+    EXPECT_EQ(lastErrorSentence(), "A record for the default passive range is required.");
 }
 
 } // namespace

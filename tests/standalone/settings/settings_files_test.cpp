@@ -13,7 +13,7 @@ constexpr const char* goldenFtp =
 # takes effect when the service starts next.
 version = 1
 
-# Services that run: 1 is FTP, 2 is FTPS, 3 is both (any number, default 0).
+# Services that run: 1 is FTP, 2 is FTPS, 3 is both (-2147483648 to 2147483647, default 0).
 service_flags = 0
 
 # Idle time after which a session ends; 0 is never (seconds, 0 to 2147483647, default 300).
@@ -55,10 +55,10 @@ maxuploadrate = 0
 # Download limit of a session; 0 is none (KB/s of 1024 bytes, 0 to 2147483647, default 0).
 maxdownloadrate = 0
 
-# Connections from one client address; 0 is any number (0 to 2147483647, default 0).
+# Connections from one client address; 0 is no limit (0 to 2147483647, default 0).
 max_conn_per_ip = 0
 
-# Kept unchanged for other programs (any number, default 0).
+# Kept unchanged for other programs (-2147483648 to 2147483647, default 0).
 reserved = 0
 
 # Users are confined to their home folders (0 or 1, default 0).
