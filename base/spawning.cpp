@@ -2,6 +2,8 @@
 
 #include "base/file.h"
 
+#include <signal.h>
+
 namespace velt {
 
 Spawn::Spawn() {

@@ -4,7 +4,6 @@
 
 #include "base/result.h"
 
-#include <signal.h>
 #include <spawn.h>
 #include <sys/types.h>
 

@@ -13,7 +13,6 @@
 #include <cstdlib>
 #include <functional>
 #include <iterator>
-#include <limits>
 #include <mutex>
 #include <sstream>
 

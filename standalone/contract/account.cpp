@@ -5,7 +5,6 @@
 
 #include <limits>
 #include <map>
-#include <memory>
 #include <mutex>
 #include <string>
 #include <tuple>
@@ -15,62 +14,48 @@ namespace {
 // Callers keep the records and release none. One that was handed out is therefore never altered or freed, and
 // the same account in the same state is the same record again: there are never more of them than accounts
 // that were looked up.
-struct UserRecord {
-    std::string name;
-    std::string description;
-    VELT_USER record{};
-};
-
-struct GroupRecord {
-    std::string name;
-    VELT_GROUP record{};
-};
-
-VELT_USER* internUser(velt::UserEntry user) {
+VELT_USER* internUser(const velt::UserEntry& user) {
     static std::mutex mutex;
-    static std::map<std::tuple<std::string, std::string, uid_t>, std::unique_ptr<UserRecord>> records;
+    static std::map<std::tuple<std::string, std::string, uid_t>, VELT_USER> records;
     const std::lock_guard lock(mutex);
-    std::unique_ptr<UserRecord>& slot = records[{user.name, user.description, user.uid}];
-    if (slot == nullptr) {
-        slot = std::make_unique<UserRecord>();
-        slot->name = std::move(user.name);
-        slot->description = std::move(user.description);
-        slot->record = {slot->name.c_str(), slot->description.c_str(), static_cast<int>(user.uid)};
+    const auto [record, isNew] = records.try_emplace({user.name, user.description, user.uid});
+    if (isNew) {
+        const auto& [name, description, uid] = record->first;
+        record->second = {name.c_str(), description.c_str(), static_cast<int>(uid)};
     }
-    return &slot->record;
+    return &record->second;
 }
 
-VELT_GROUP* internGroup(velt::GroupEntry group) {
+VELT_GROUP* internGroup(const velt::GroupEntry& group) {
     static std::mutex mutex;
-    static std::map<std::tuple<std::string, gid_t>, std::unique_ptr<GroupRecord>> records;
+    static std::map<std::tuple<std::string, gid_t>, VELT_GROUP> records;
     const std::lock_guard lock(mutex);
-    std::unique_ptr<GroupRecord>& slot = records[{group.name, group.gid}];
-    if (slot == nullptr) {
-        slot = std::make_unique<GroupRecord>();
-        slot->name = std::move(group.name);
-        slot->record = {slot->name.c_str(), static_cast<int>(group.gid)};
+    const auto [record, isNew] = records.try_emplace({group.name, group.gid});
+    if (isNew) {
+        const auto& [name, gid] = record->first;
+        record->second = {name.c_str(), static_cast<int>(gid)};
     }
-    return &slot->record;
+    return &record->second;
 }
 
 constexpr auto largestId = static_cast<unsigned>(std::numeric_limits<int>::max());
 
 velt::Result<VELT_USER*> lookUpUser(const char* name) {
-    VELT_ASSIGN_OR_RETURN(velt::UserEntry user, velt::findUser(name));
+    VELT_ASSIGN_OR_RETURN(const velt::UserEntry user, velt::findUser(name));
     if (user.uid > largestId) {
         return velt::Error(velt::ErrorNumber::invalid,
                            "The number of user \"" + user.name + "\" is too large.");
     }
-    return internUser(std::move(user));
+    return internUser(user);
 }
 
 velt::Result<VELT_GROUP*> lookUpGroup(const char* name) {
-    VELT_ASSIGN_OR_RETURN(velt::GroupEntry group, velt::findGroup(name));
+    VELT_ASSIGN_OR_RETURN(const velt::GroupEntry group, velt::findGroup(name));
     if (group.gid > largestId) {
         return velt::Error(velt::ErrorNumber::invalid,
                            "The number of group \"" + group.name + "\" is too large.");
     }
-    return internGroup(std::move(group));
+    return internGroup(group);
 }
 
 template<class Record> int get(velt::Result<Record*> (&lookUp)(const char*), const char* name, Record** out) {

@@ -53,14 +53,14 @@ Result<> writeSystemInformation(std::string_view key, std::string_view value) {
 
 VLIBCSzList* VLIBCSzListAlloc(int capacity) {
     velt::StringList* list = nullptr;
-    const int result = velt::atBoundary([&] {
+    velt::atBoundary([&] {
         auto made = std::make_unique<velt::StringList>();
         made->texts.reserve(static_cast<std::size_t>(std::max(capacity, 0)));
         made->capacity = std::max(capacity, 0);
         list = made.release();
         return 0;
     });
-    return result < 0 ? nullptr : list;
+    return list;
 }
 
 const char* VLIBCSzListGet(const VLIBCSzList* list, int index) {
@@ -83,11 +83,11 @@ void VLIBCSzListFree(VLIBCSzList* list) {
 
 VLIBCSzHash* VLIBCSzHashAlloc(int /*initialSize*/) {
     VLIBCSzHash* map = nullptr;
-    const int result = velt::atBoundary([&] {
+    velt::atBoundary([&] {
         map = new VLIBCSzHash();
         return 0;
     });
-    return result < 0 ? nullptr : map;
+    return map;
 }
 
 int VLIBCSzHashSetValue(VLIBCSzHash** map, const char* key, const char* value) {

@@ -10,8 +10,7 @@ namespace {
 struct LastError {
     ErrorNumber number = ErrorNumber::none;
     std::string sentence;
-    const char* file = "";
-    int line = 0;
+    SourcePlace where;
 };
 
 LastError& lastError() {
@@ -32,8 +31,7 @@ int fail(ErrorNumber number, std::string sentence, SourcePlace where) {
     LastError& error = lastError();
     error.number = number;
     error.sentence = std::move(sentence);
-    error.file = bareFileName(where.file);
-    error.line = where.line;
+    error.where = {bareFileName(where.file), where.line};
     return -1;
 }
 
@@ -47,7 +45,7 @@ ErrorNumber lastErrorNumber() {
 }
 
 SourcePlace lastErrorPlace() {
-    return {lastError().file, lastError().line};
+    return lastError().where;
 }
 
 const std::string& lastErrorSentence() {

@@ -4,7 +4,6 @@
 #include "standalone/contract/last_error.h"
 
 #include <memory>
-#include <new>
 
 namespace {
 

@@ -7,7 +7,6 @@
 
 #include <algorithm>
 #include <memory>
-#include <string>
 
 namespace velt {
 namespace {

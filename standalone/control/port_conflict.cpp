@@ -21,7 +21,6 @@ struct Question {
     VELT_FTP_PORT_RANGE range;
     const Daemon* daemon; ///< the service's, when it is one of ours
 
-    bool holds(int port) const { return range.first <= port && port <= range.last; }
     bool isOnePort() const { return range.first == range.last; }
 };
 
@@ -138,7 +137,7 @@ std::optional<PortConflict> conflictWithListener(const Question& question, const
         return !question.isOnePort() && isOwnPort(question, claims, port);
     };
     std::erase_if(sockets, [&](const ListeningSocket& socket) {
-        return !question.holds(socket.port) || canDoWithout(socket.port);
+        return !contains(question.range, socket.port) || canDoWithout(socket.port);
     });
     if (sockets.empty()) {
         return std::nullopt;

@@ -1,5 +1,6 @@
 #include "standalone/core/effects.h"
 
+#include <array>
 #include <utility>
 
 namespace velt {
@@ -39,23 +40,10 @@ Result<> actAndReport(Effect effect, std::string_view subject, const std::functi
 } // namespace
 
 std::string_view effectName(Effect effect) {
-    switch (effect) {
-    case Effect::store:
-        return "store";
-    case Effect::firewall:
-        return "firewall";
-    case Effect::stop:
-        return "stop";
-    case Effect::start:
-        return "start";
-    case Effect::runKey:
-        return "run key";
-    case Effect::event:
-        return "event";
-    case Effect::logEntry:
-        return "log";
-    }
-    return "";
+    // In the order of Effect.
+    constexpr std::array<std::string_view, 7> names{"store",   "firewall", "stop", "start",
+                                                    "run key", "event",    "log"};
+    return names.at(static_cast<std::size_t>(effect));
 }
 
 Result<> perform(Effect effect, std::string_view subject, const std::function<Result<>()>& act) {

@@ -13,24 +13,20 @@
 namespace velt {
 namespace {
 
-constexpr std::array<std::pair<std::string_view, FirewallMode>, 3> modes{{
-    {"off", FirewallMode::off},
-    {"accept", FirewallMode::accept},
-    {"drop", FirewallMode::drop},
-}};
+/// In the order of FirewallMode.
+constexpr std::array<std::string_view, 3> modes{"off", "accept", "drop"};
 
 FirewallMode readMode(StrictFile& file, FirewallMode fallback) {
     const auto text = file.value("mode", optionalKey);
     if (!text) {
         return fallback;
     }
-    const auto* const known =
-        std::find_if(modes.begin(), modes.end(), [&](const auto& mode) { return mode.first == *text; });
+    const auto* const known = std::ranges::find(modes, *text);
     if (known == modes.end()) {
         file.refuse("mode", "off, accept or drop");
         return fallback;
     }
-    return known->second;
+    return static_cast<FirewallMode>(known - modes.begin());
 }
 
 std::vector<VELT_FTP_PORT_RANGE> readPorts(StrictFile& file) {

@@ -3,7 +3,6 @@
 #include "base/number_text.h"
 #include "base/unique_fd.h"
 
-#include <fcntl.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 

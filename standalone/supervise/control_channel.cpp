@@ -23,11 +23,8 @@ namespace {
 
 constexpr std::size_t largestMessage = 64UL * 1024;
 constexpr std::string_view failure = "failed "; ///< begins an answer that is not "ok"
-constexpr std::array<std::pair<Command, std::string_view>, 3> commandNames{{
-    {Command::start, "start"},
-    {Command::pause, "pause"},
-    {Command::stop, "stop"},
-}};
+/// In the order of Command.
+constexpr std::array<std::string_view, 3> commandNames{"start", "pause", "stop"};
 
 /// The socket's address by way of the folder's descriptor: a state root may lie deeper than the 107 bytes
 /// that an address has room for.
@@ -105,11 +102,7 @@ std::vector<std::string> splitFields(const std::string& message) {
 std::string encodeRequest(const ControlRequest& request) {
     std::string message;
     const auto add = [&message](std::string_view field) { message.append(field).push_back('\0'); };
-    for (const auto& [command, name] : commandNames) {
-        if (command == request.command) {
-            add(name);
-        }
-    }
+    add(commandNames.at(static_cast<std::size_t>(request.command)));
     if (request.command == Command::start) {
         add(request.order.configurationHash);
         add(std::to_string(request.order.ports.size()));
@@ -126,12 +119,11 @@ std::string encodeRequest(const ControlRequest& request) {
 Result<ControlRequest> decodeRequest(const std::string& message) {
     const Error malformed("the request was not understood");
     const std::vector<std::string> fields = splitFields(message);
-    const auto* const known = std::ranges::find_if(
-        commandNames, [&](const auto& each) { return !fields.empty() && fields[0] == each.second; });
+    const auto* const known = std::ranges::find(commandNames, fields.empty() ? "" : fields[0]);
     if (known == commandNames.end()) {
         return malformed;
     }
-    ControlRequest request{known->first, {}};
+    ControlRequest request{static_cast<Command>(known - commandNames.begin()), {}};
     if (request.command != Command::start) {
         return request;
     }

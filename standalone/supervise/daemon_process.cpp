@@ -14,12 +14,10 @@
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
 #include <csignal>
 #include <cstring>
 #include <string_view>
 #include <utility>
-#include <vector>
 
 namespace velt {
 namespace {

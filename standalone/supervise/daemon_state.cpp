@@ -18,28 +18,12 @@ namespace {
 constexpr std::string_view firstLine = "velt-supervise 2";
 constexpr std::string_view bootKey = "boot ";
 
-constexpr std::array<std::pair<RunState, std::string_view>, 3> stateNames{{
-    {RunState::running, "running"},
-    {RunState::paused, "paused"},
-    {RunState::failed, "failed"},
-}};
-
-std::string_view nameOf(RunState state) {
-    for (const auto& [value, name] : stateNames) {
-        if (value == state) {
-            return name;
-        }
-    }
-    return "stopped";
-}
+/// In the order of RunState.
+constexpr std::array<std::string_view, 4> stateNames{"stopped", "running", "paused", "failed"};
 
 RunState stateNamed(std::string_view text) {
-    for (const auto& [value, name] : stateNames) {
-        if (name == text) {
-            return value;
-        }
-    }
-    return RunState::stopped;
+    const auto* const found = std::ranges::find(stateNames, text);
+    return found == stateNames.end() ? RunState::stopped : static_cast<RunState>(found - stateNames.begin());
 }
 
 std::string oneLine(std::string text) {
@@ -87,7 +71,9 @@ std::string render(const DaemonState& state) {
             text << key << ' ' << process.pid << ' ' << process.startTime << '\n';
         }
     };
-    text << firstLine << '\n' << bootKey << bootId() << '\n' << "state " << nameOf(state.state) << '\n';
+    text << firstLine << '\n'
+         << bootKey << bootId() << '\n'
+         << "state " << stateNames.at(static_cast<std::size_t>(state.state)) << '\n';
     processLine("supervisor", state.supervisor);
     processLine("daemon", state.daemon);
     text << "configuration " << oneLine(state.configurationHash) << '\n';
