@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <system_error>
 
 namespace velt {
 
@@ -31,6 +32,21 @@ bool isOn(const Daemon& daemon, const DaemonSettings& settings, std::string_view
            std::ranges::any_of(settings.services, [&](const ServiceSwitch& each) {
                return each.on && each.service == name->service;
            });
+}
+
+void removeFormerPlans(const DaemonPlan& plan) {
+    if (plan.folder.empty()) {
+        return;
+    }
+    // What cannot be removed takes a little room until the next time, no more.
+    std::error_code ignored;
+    for (std::filesystem::directory_iterator entry(plan.folder.parent_path(), ignored), end;
+         !ignored && entry != end; entry.increment(ignored)) {
+        if (entry->path() != plan.folder) {
+            std::error_code stays;
+            std::filesystem::remove_all(entry->path(), stays);
+        }
+    }
 }
 
 std::string titleOf(const Daemon& daemon) {

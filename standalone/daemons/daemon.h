@@ -4,8 +4,9 @@
 
 #include "base/result.h"
 #include "ftp/ftp_library.h"
-#include "standalone/daemons/daemon_plan.h"
+#include "standalone/supervise/daemon_order.h"
 
+#include <filesystem>
 #include <optional>
 #include <span>
 #include <string>
@@ -48,6 +49,12 @@ struct UnitDropIn {
     std::string_view text;
 };
 
+/// A configuration that was written, and how the daemon runs with it.
+struct DaemonPlan {
+    DaemonOrder order;
+    std::filesystem::path folder; ///< holds what this configuration alone uses; its siblings are former ones'
+};
+
 /// A row of the table. Its functions are thread-safe.
 struct Daemon {
     std::string_view name;     ///< of its files and its unit: "ftpd"
@@ -83,6 +90,10 @@ const Daemon* daemonServing(std::string_view nameInContract);
 
 /// Whether the settings of this daemon switch on what the contract calls by this name.
 bool isOn(const Daemon& daemon, const DaemonSettings& settings, std::string_view nameInContract);
+
+/// Removes what former configurations left beside the folder of this one. To be called when its daemon
+/// serves: until then the former one may be needed again.
+void removeFormerPlans(const DaemonPlan& plan);
 
 /// "The FTP daemon": how sentences begin.
 std::string titleOf(const Daemon& daemon);

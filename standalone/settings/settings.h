@@ -27,6 +27,11 @@ struct SftpSettings {
     int port = 0;
 };
 
+/// Where the services may be reached, which an administrator says in a file; the API has no setting for it.
+struct NetworkSettings {
+    bool loopbackOnly = false; ///< the services listen on 127.0.0.1 and nowhere else
+};
+
 /// The passive range in force without a custom one.
 inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
 
@@ -51,6 +56,14 @@ VELT_FTP_PORT_RANGE passiveRange(const _tag_VELT_FTP_CONF_& record);
 /// the line.
 Result<FtpSettings> loadFtpSettings();
 Result<SftpSettings> loadSftpSettings();
+
+/// The settings of /etc/velt/network.conf below the state root, the defaults where there is none:
+///
+///     version = 1
+///     loopback_only = 1
+///
+/// Thread-safe.
+Result<NetworkSettings> loadNetworkSettings();
 
 /// Whether a daemon would take these settings; errors name the setting, the value and what is allowed. Looks
 /// at numbers and texts only, starts nothing.

@@ -48,6 +48,14 @@ Result<SftpSettings> loadSftpSettings() {
     return loadFile(paths::sftpSettings, sftpSettingsFile());
 }
 
+Result<NetworkSettings> loadNetworkSettings() {
+    VELT_ASSIGN_OR_RETURN(StrictFile file, StrictFile::load(statePath(paths::networkSettings)));
+    NetworkSettings settings;
+    settings.loopbackOnly = file.boolean("loopback_only", settings.loopbackOnly);
+    VELT_RETURN_IF_ERROR(file.finish());
+    return settings;
+}
+
 Result<> storeFtpSettings(const FtpSettings& settings) {
     return storeFile("ftp settings", paths::ftpSettings, formatSettings(ftpSettingsFile(), settings));
 }

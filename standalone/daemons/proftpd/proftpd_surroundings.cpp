@@ -8,7 +8,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/tls/certificate.h"
-#include "standalone/settings/network_settings.h"
+#include "standalone/settings/settings.h"
 #include "standalone/shares/share_store.h"
 
 #include <netinet/in.h>

@@ -10,7 +10,7 @@
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/sshd/host_keys.h"
 #include "standalone/daemons/sshd/sshd_configuration.h"
-#include "standalone/settings/network_settings.h"
+#include "standalone/settings/settings.h"
 
 #include <sys/stat.h>
 #include <unistd.h>

@@ -3,7 +3,7 @@
 #define VELT_STANDALONE_DAEMONS_SSHD_SSHD_PLAN_H
 
 #include "base/result.h"
-#include "standalone/daemons/daemon_plan.h"
+#include "standalone/daemons/daemon.h"
 #include "standalone/settings/settings.h"
 
 #include <optional>

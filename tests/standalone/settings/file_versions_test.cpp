@@ -1,7 +1,7 @@
 // Files that earlier versions wrote, or that were written for them, stay readable.
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/journal/log_retention.h"
-#include "standalone/settings/network_settings.h"
+#include "standalone/settings/settings.h"
 #include "standalone/settings/settings_files.h"
 #include "tests/standalone/settings/settings_fixture.h"
 #include "tests/support/files.h"

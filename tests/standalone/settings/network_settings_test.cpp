@@ -1,4 +1,4 @@
-#include "standalone/settings/network_settings.h"
+#include "standalone/settings/settings.h"
 
 #include "tests/standalone/settings/settings_fixture.h"
 
