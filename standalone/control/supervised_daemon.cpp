@@ -125,8 +125,7 @@ Result<> SupervisedDaemon::stop() {
 }
 
 DaemonState daemonState(const Daemon& daemon) {
-    return readDaemonState(stateFile(statePath(paths::run), std::string(daemon.name)))
-        .value_or(DaemonState{});
+    return readDaemonState(stateFile(statePath(paths::run), daemon.name)).value_or(DaemonState{});
 }
 
 bool systemdKeepsSupervisors() {

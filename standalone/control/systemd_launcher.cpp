@@ -31,7 +31,7 @@ Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const Daem
     // former settings with it.
     const ProcessResult started = runProcess({places_.systemctl, "restart", unit_}, {}, startLimit);
     if (started.exitCode == 0) {
-        const auto now = readDaemonState(stateFile(folder, std::string(daemon_.name)));
+        const auto now = readDaemonState(stateFile(folder, daemon_.name));
         return now && isServing(*now) ? Result<>()
                                       : Error("systemd reports a start, but the daemon does not serve");
     }
@@ -42,7 +42,7 @@ Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const Daem
 }
 
 Result<> SystemdLauncher::keep(const std::filesystem::path& folder, const DaemonOrder& order) {
-    const auto file = orderFile(folder, std::string(daemon_.name));
+    const auto file = orderFile(folder, daemon_.name);
     return replaceFile(file, encodeRequest({Command::start, order}), 0600);
 }
 

@@ -8,7 +8,6 @@
 #include <algorithm>
 #include <array>
 #include <sstream>
-#include <utility>
 
 namespace velt {
 namespace {

@@ -15,7 +15,6 @@
 #include <cerrno>
 #include <cstring>
 #include <string_view>
-#include <utility>
 #include <vector>
 
 namespace velt {

@@ -10,7 +10,6 @@
 #include <fstream>
 #include <sstream>
 #include <string_view>
-#include <utility>
 
 namespace velt {
 namespace {
@@ -92,16 +91,16 @@ std::string render(const DaemonState& state) {
 
 } // namespace
 
-std::filesystem::path stateFile(const std::filesystem::path& folder, const std::string& daemon) {
-    return folder / (daemon + ".state");
+std::filesystem::path stateFile(const std::filesystem::path& folder, std::string_view daemon) {
+    return folder / (std::string(daemon) + ".state");
 }
 
-std::filesystem::path lockFile(const std::filesystem::path& folder, const std::string& daemon) {
-    return folder / (daemon + ".lock");
+std::filesystem::path lockFile(const std::filesystem::path& folder, std::string_view daemon) {
+    return folder / (std::string(daemon) + ".lock");
 }
 
-std::filesystem::path orderFile(const std::filesystem::path& folder, const std::string& daemon) {
-    return folder / (daemon + ".order");
+std::filesystem::path orderFile(const std::filesystem::path& folder, std::string_view daemon) {
+    return folder / (std::string(daemon) + ".order");
 }
 
 std::optional<DaemonState> readDaemonState(const std::filesystem::path& file) {

@@ -9,6 +9,7 @@
 #include <filesystem>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace velt {
@@ -32,9 +33,9 @@ struct DaemonState {
 };
 
 /// The files of a daemon in the folder that holds those of all.
-std::filesystem::path stateFile(const std::filesystem::path& folder, const std::string& daemon);
-std::filesystem::path lockFile(const std::filesystem::path& folder, const std::string& daemon);
-std::filesystem::path orderFile(const std::filesystem::path& folder, const std::string& daemon);
+std::filesystem::path stateFile(const std::filesystem::path& folder, std::string_view daemon);
+std::filesystem::path lockFile(const std::filesystem::path& folder, std::string_view daemon);
+std::filesystem::path orderFile(const std::filesystem::path& folder, std::string_view daemon);
 
 /// Nothing when there is no such file, not one of this form, or one from before the machine started: its
 /// processes are gone, and others may have their numbers.

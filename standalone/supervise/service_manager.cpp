@@ -5,7 +5,6 @@
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <syslog.h>
-#include <unistd.h>
 
 #include <cerrno>
 #include <cstddef>
