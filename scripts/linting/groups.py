@@ -1,5 +1,6 @@
 """Sources that clang-tidy can read as one text, and that text."""
 
+import collections
 import json
 import re
 import shlex
@@ -14,6 +15,8 @@ DEFINED = re.compile(
 TESTS = re.compile(r"^(?:TEST\w*|INSTANTIATE\w*)\((\w+),\s*(\w+)", re.MULTILINE)
 MACROS = re.compile(r"^#define (\w+)", re.MULTILINE)
 INCLUDED = re.compile(r"#include (\S+)")
+# What asks for definitions, which another source of a group may have: read alone, and with all of its own.
+TESTED = re.compile(r"^\s*#\s*(if|elif)", re.MULTILINE)
 BORROWED = re.compile(r"^using (?!namespace\b)[^=\n]*?(\w+);|^namespace (\w+) =", re.MULTILINE)
 
 
@@ -94,11 +97,13 @@ def flags_and_definitions(entry):
 
 
 def commands(build):
-    """The compile command of each source. The second of two would have the source read twice."""
-    first = {}
+    """The flags and definitions that each source is compiled with, more than once if they differ."""
+    known = collections.defaultdict(list)
     for entry in json.loads((build / "compile_commands.json").read_text()):
-        first.setdefault(entry["file"], entry)
-    return first
+        way = flags_and_definitions(entry)
+        if way not in known[entry["file"]]:
+            known[entry["file"]].append(way)
+    return known
 
 
 def settings_folder(root, source):
@@ -118,6 +123,11 @@ def borrows_in_vain(text):
     return any(len(re.findall(rf"\b{name}\b", text)) < 2 for name in names)
 
 
+def ways_that_matter(ways, text):
+    """One way of compiling is enough for a source that does not ask for definitions."""
+    return ways if TESTED.search(text) else ways[:1]
+
+
 def make(root, build, names):
     """The named sources in groups, and those of them that no target compiles."""
     known = commands(build)
@@ -129,14 +139,15 @@ def make(root, build, names):
             continue
         text = source.read_text()
         settings = settings_folder(root, source)
-        flags, definitions = flags_and_definitions(known[str(source)])
+        ways = ways_that_matter(known[str(source)], text)
         declared = names_of(text)
-        single = source.suffix == ".c" or borrows_in_vain(text)
-        takers = (group for group in groups if group.takes(settings, flags, definitions, declared))
-        group = None if single else next(takers, None)
-        if not group:
-            group = Group(settings, flags)
-            group.closed = single
-            groups.append(group)
-        group.add(source, definitions, declared)
+        single = source.suffix == ".c" or borrows_in_vain(text) or TESTED.search(text)
+        for flags, definitions in ways:
+            takers = (group for group in groups if group.takes(settings, flags, definitions, declared))
+            group = None if single else next(takers, None)
+            if not group:
+                group = Group(settings, flags)
+                group.closed = single
+                groups.append(group)
+            group.add(source, definitions, declared)
     return groups, unknown

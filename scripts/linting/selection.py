@@ -7,6 +7,9 @@ import subprocess
 
 # What decides how every source is read.
 CONFIGURATION = re.compile(r"(^|/)\.clang-tidy$|^cmake/|^CMakeLists\.txt$|^CMakePresets\.json$|^scripts/lint(ing/|$)")
+# A line of a build file that names a source and nothing else.
+SOURCE_LINE = re.compile(r"^[+-]\s*[\w./-]+\.(cpp|c)\)?$")
+NOT_IGNORED = ["--cached", "--others", "--exclude-standard"]
 INCLUDE = re.compile(r'^\s*#\s*include\s*"([^"]+)"', re.MULTILINE)
 
 
@@ -16,7 +19,7 @@ def git(root, *arguments):
 
 
 def sources(root):
-    return [name for name in git(root, "ls-files", "*.cpp", "*.c") if (root / name).exists()]
+    return [name for name in git(root, "ls-files", *NOT_IGNORED, "*.cpp", "*.c") if (root / name).exists()]
 
 
 def uncommitted(root):
@@ -26,7 +29,7 @@ def uncommitted(root):
 def includers(root):
     """For each file, the files that include it."""
     found = collections.defaultdict(set)
-    for name in git(root, "ls-files", "*.cpp", "*.c", "*.h"):
+    for name in git(root, "ls-files", *NOT_IGNORED, "*.cpp", "*.c", "*.h"):
         if not (root / name).exists():
             continue
         for header in INCLUDE.findall((root / name).read_text()):
@@ -48,6 +51,13 @@ def touched(root, changed):
     return reached
 
 
+def says_more_than_sources(root, base, name):
+    """Whether a build file changed by more than which sources there are: what it says may hold for other folders."""
+    lines = git(root, "diff", "--unified=0", "--no-renames", base, "--", name)
+    changes = [line for line in lines if re.match(r"[+-](?!\+\+|--)", line)]
+    return not lines or any(not SOURCE_LINE.match(line) for line in changes)
+
+
 def changed_sources(root, stamp):
     """The sources that the changes since the recorded commit touch, and in a few words why these."""
     everything = sources(root)
@@ -59,8 +69,9 @@ def changed_sources(root, stamp):
     decisive = [name for name in changed if CONFIGURATION.search(name)]
     if decisive:
         return everything, f"all, since {decisive[0]} changed"
-    # A folder's build file has the definitions that its sources are compiled with.
-    folders = tuple(name[: -len("CMakeLists.txt")] for name in changed if name.endswith("/CMakeLists.txt"))
+    builds = [name for name in changed if name.endswith("/CMakeLists.txt") and says_more_than_sources(root, base, name)]
+    if builds:
+        return everything, f"all, since {builds[0]} may compile them differently"
     reached = touched(root, changed)
-    chosen = [name for name in everything if name in reached or name.startswith(folders)]
+    chosen = [name for name in everything if name in reached]
     return chosen, f"those that the changes since {base[:12]} touch, of {len(everything)}"
