@@ -98,12 +98,13 @@ HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<F
     return problemWith(meaning.status, std::move(members), requestId);
 }
 
-/// The module accepted the change, but a service that is switched on does not run.
+/// The module accepted the request, but a service that is switched on does not run.
 HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
+    const std::string extent = outcome.platform.changed ? "The change is stored. " : "Nothing was changed. ";
     const auto describe = [](const ServiceDown& down) { return toObject(down); };
     return problemWith(500,
                        jsonObject({{"title", "A service that is switched on does not run"},
-                                   {"detail", "The change is stored. " + sentenceOf(outcome.down)},
+                                   {"detail", extent + sentenceOf(outcome.down)},
                                    {"changed", outcome.platform.changed},
                                    {"down", jsonArray(outcome.down, describe)}}),
                        requestId);

@@ -34,8 +34,9 @@ constexpr std::array<ModuleName, 3> moduleNames{{
 
 using Modules = std::vector<std::shared_ptr<const NameService>>;
 
-/// What is known of the accounts, and when it was learned. Files are read under the lock, so that a change of
-/// a large one is read once for all threads. A domain may take long to answer or not answer at all: it is
+/// What is known of the accounts, and when it was learned. A file that cannot be read for a moment, for want
+/// of descriptors say, is not taken for an empty one. Files are read under the lock, so that a change of a
+/// large one is read once for all threads. A domain may take long to answer or not answer at all: it is
 /// asked outside of the lock, by one thread at a time, and the others use what it said before.
 class Directory {
 public:
@@ -140,6 +141,11 @@ void Directory::refreshRemote() {
     remoteReadAt_ = Clock::now();
 }
 
+/// "" for a file that is missing, and for one that could not be read this time.
+std::string textOf(const Result<std::optional<std::string>>& file) {
+    return file ? file->value_or("") : "";
+}
+
 std::shared_ptr<const UserSnapshot> Directory::users() {
     refreshRemote();
     const std::lock_guard lock(mutex_);
@@ -148,9 +154,13 @@ std::shared_ptr<const UserSnapshot> Directory::users() {
     if (users_ != nullptr && passwd == passwdStamp_ && loginDefs == loginDefsStamp_) {
         return users_;
     }
-    users_ = UserSnapshot::make(parsePasswd(readFile(sources_.passwd).valueOr("")), remoteUsers_,
-                                parseLoginDefs(readFile(sources_.loginDefs).valueOr("")));
-    passwdStamp_ = passwd;
+    const auto text = readOptionalFile(sources_.passwd);
+    if (!text && users_ != nullptr) {
+        return users_;
+    }
+    users_ = UserSnapshot::make(parsePasswd(textOf(text)), remoteUsers_,
+                                parseLoginDefs(textOf(readOptionalFile(sources_.loginDefs))));
+    passwdStamp_ = text ? passwd : FileStamp();
     loginDefsStamp_ = loginDefs;
     return users_;
 }
@@ -158,9 +168,13 @@ std::shared_ptr<const UserSnapshot> Directory::users() {
 std::shared_ptr<const GroupSnapshot> Directory::groups() {
     const std::lock_guard lock(mutex_);
     const FileStamp stamp = FileStamp::of(sources_.group);
-    if (groups_ == nullptr || !(stamp == groupStamp_)) {
-        groups_ = std::make_shared<const GroupSnapshot>(parseGroup(readFile(sources_.group).valueOr("")));
-        groupStamp_ = stamp;
+    if (groups_ != nullptr && stamp == groupStamp_) {
+        return groups_;
+    }
+    const auto text = readOptionalFile(sources_.group);
+    if (text || groups_ == nullptr) {
+        groups_ = std::make_shared<const GroupSnapshot>(parseGroup(textOf(text)));
+        groupStamp_ = text ? stamp : FileStamp();
     }
     return groups_;
 }

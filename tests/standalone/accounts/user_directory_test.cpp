@@ -5,6 +5,8 @@
 
 #include <gtest/gtest.h>
 
+#include <sys/resource.h>
+
 #include <atomic>
 #include <thread>
 
@@ -112,6 +114,41 @@ TEST_F(UserDirectoryTest, AMissingFileMeansNoUsers) {
     std::filesystem::remove(folder_.path() / "passwd");
     EXPECT_TRUE(allUsers()->empty());
     EXPECT_FALSE(userByName("anna"));
+}
+
+class NoDescriptors {
+public:
+    NoDescriptors() {
+        getrlimit(RLIMIT_NOFILE, &former_);
+        const rlimit none{0, former_.rlim_max};
+        setrlimit(RLIMIT_NOFILE, &none);
+    }
+    ~NoDescriptors() { setrlimit(RLIMIT_NOFILE, &former_); }
+    NoDescriptors(const NoDescriptors&) = delete;
+    NoDescriptors& operator=(const NoDescriptors&) = delete;
+
+private:
+    rlimit former_{};
+};
+
+TEST_F(UserDirectoryTest, AFileThatCannotBeReadForAMomentIsNoEmptyOne) {
+    {
+        const NoDescriptors none;
+        EXPECT_FALSE(userByName("anna"));
+        EXPECT_FALSE(groupByName("staff"));
+    }
+    EXPECT_TRUE(userByName("anna"));
+    EXPECT_TRUE(groupByName("staff"));
+    folder_.write("passwd", "max:x:1003:1003:Max:/home/max:/bin/sh\n");
+    folder_.write("group", "crew:x:52:max\n");
+    {
+        const NoDescriptors none;
+        EXPECT_TRUE(userByName("anna")) << "as it was last read";
+        EXPECT_TRUE(groupByName("staff"));
+    }
+    EXPECT_TRUE(userByName("max"));
+    EXPECT_TRUE(groupByName("crew"));
+    EXPECT_FALSE(groupByName("staff"));
 }
 
 TEST_F(UserDirectoryTest, OfTwoEntriesWithOneNameTheFirstCounts) {
