@@ -122,6 +122,17 @@ TEST_F(SftpService, refusesRootAndStrangers) {
     EXPECT_NE(sftp("pwd\n", "carol").exitCode, 0) << "she has no key here";
 }
 
+TEST_F(SftpService, whoDoesNotLogInKeepsNobodyOut) {
+    start(port);
+    std::vector<UniqueFd> silent;
+    for (int i = 0; i < 250; i++) {
+        silent.push_back(connectTo("127.0.0.1", port, "127.0.0.2"));
+    }
+    for (int i = 0; i < 5; i++) {
+        EXPECT_EQ(sftp("ls file\n").exitCode, 0);
+    }
+}
+
 // Rules and grants are FTP's; here the modes must say the same.
 TEST_F(SftpService, goesByTheRightsOfTheFileSystemAlone) {
     fs::create_directories("/mnt/srv/share");

@@ -12,6 +12,11 @@ std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places) {
     }
     text += "PidFile none\n"
             "PermitRootLogin no\n"
+            // Many may log in at once; those of one address who do not are few, and not for long.
+            "LoginGraceTime 30\n"
+            "MaxStartups 200:30:1000\n"
+            "PerSourceMaxStartups 20\n"
+            "PerSourceNetBlockSize 32:64\n"
             "PrintMotd no\n"
             "UseDNS no\n";
     text += places.privileged ? "UsePAM yes\n" : "UsePAM no\n";
