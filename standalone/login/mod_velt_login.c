@@ -5,6 +5,8 @@
  * DefaultRoot and as the directory of <Anonymous>. For everybody else the folder is empty, so a session that
  * gets there without this module sees nothing. When the program refuses, the login fails as with a wrong
  * password.
+ *
+ * No session makes a file run with the rights of its owner or group.
  */
 #include "conf.h"
 #include "privs.h"
@@ -12,6 +14,7 @@
 #include "standalone/login/login_program.h"
 
 #include <sched.h>
+#include <sys/stat.h>
 
 #define MODULE_VERSION "mod_velt_login/2.0"
 
@@ -143,6 +146,24 @@ static void on_chroot(const void* root, void* ignored) {
     }
 }
 
+static int forbids(mode_t mode) {
+    if ((mode & (S_ISUID | S_ISGID)) != 0) {
+        errno = EPERM;
+        return TRUE;
+    }
+    return FALSE;
+}
+
+static int change_mode(pr_fs_t* fs, const char* path, mode_t mode) {
+    (void)fs;
+    return forbids(mode) ? -1 : chmod(path, mode);
+}
+
+static int change_mode_of_open_file(pr_fh_t* file, int descriptor, mode_t mode) {
+    (void)file;
+    return forbids(mode) ? -1 : fchmod(descriptor, mode);
+}
+
 /* usage: VeltLoginView program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
 MODRET set_velt_login_view(cmd_rec* cmd) {
     if (cmd->argc < 4 || cmd->argc > 5) {
@@ -161,6 +182,14 @@ MODRET set_velt_login_view(cmd_rec* cmd) {
 }
 
 static int velt_sess_init(void) {
+    int exact = FALSE;
+    /* The one for all paths: one of our own would not be asked for the names in the first folder. */
+    pr_fs_t* files = pr_get_fs("/", &exact);
+    if (files == NULL) {
+        return -1;
+    }
+    files->chmod = change_mode;
+    files->fchmod = change_mode_of_open_file;
     if (pr_event_register(&velt_login_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
         pr_event_register(&velt_login_module, "core.chroot", on_chroot, NULL) < 0) {
         return -1;

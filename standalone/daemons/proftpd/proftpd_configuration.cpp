@@ -55,10 +55,15 @@ void renderServer(Text& text, const ProftpdPlaces& places) {
     text.line("TransferLog none");
     text.line("WtmpLog off");
     text.line("UseReverseDNS off");
+    // Who may write to a folder would make rules for everybody with a file .ftpaccess.
+    text.line("AllowOverride off");
     text.line("AllowOverwrite on");
     // Without it neither APPE nor the resumption of a broken upload is allowed.
     text.line("AllowStoreRestart on");
     text.line("ControlsEngine off");
+    // Each connection is a process, also before a login.
+    text.line("MaxInstances 2000");
+    text.line("TimeoutLogin 30");
 }
 
 void renderModules(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
@@ -204,6 +209,10 @@ void renderAnonymous(Text& text, const FtpSettings& settings, const ProftpdPlace
     text.line("  Group nogroup");
     text.line("  UserAlias anonymous ftp");
     text.line("  RequireValidShell off");
+    // What one guest leaves is open to all of them, and stays as the server made it.
+    text.line("  <Limit SITE_CHMOD MFF>");
+    text.line("    DenyAll");
+    text.line("  </Limit>");
     text.line("</Anonymous>");
 }
 

@@ -1,5 +1,6 @@
 // The FTP daemon's module at a login, where the daemon or the program that makes the view cannot do their
 // part.
+#include "base/unique_fd.h"
 #include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
@@ -15,6 +16,7 @@ extern "C" {
 }
 
 #include <array>
+#include <cerrno>
 #include <chrono>
 
 namespace velt::test {
@@ -111,6 +113,26 @@ TEST_F(LoginModule, cutsLongWords) {
     words.fill('x');
     EXPECT_EQ(velt_run_login_program(arguments.data(), 10, words.data(), words.size()), 0);
     EXPECT_STREQ(words.data(), "0123456789012345 01");
+}
+
+TEST_F(LoginModule, letsNoFileRunWithItsOwnersRights) {
+    ASSERT_EQ(logIn(script("")), login_granted);
+    const std::string file = folder_.write("file", "").string();
+    const UniqueFd opened(open(file.c_str(), O_RDONLY | O_CLOEXEC));
+    const auto modeOf = [&] {
+        struct stat status {};
+        return stat(file.c_str(), &status) == 0 ? status.st_mode & 07777U : 0;
+    };
+    EXPECT_EQ(change_mode_as_the_daemon(file.c_str(), 0751), 0);
+    EXPECT_EQ(modeOf(), 0751U);
+    EXPECT_EQ(change_mode_of_open_file_as_the_daemon(opened.get(), 01640), 0);
+    EXPECT_EQ(modeOf(), 01640U);
+    for (const unsigned mode : {04640U, 02640U, 06777U}) {
+        EXPECT_EQ(change_mode_as_the_daemon(file.c_str(), mode), -1) << mode;
+        EXPECT_EQ(errno, EPERM);
+        EXPECT_EQ(change_mode_of_open_file_as_the_daemon(opened.get(), mode), -1) << mode;
+    }
+    EXPECT_EQ(modeOf(), 01640U);
 }
 
 TEST_F(LoginModule, leavesNoDescriptorBehind) {

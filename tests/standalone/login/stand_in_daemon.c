@@ -15,6 +15,7 @@ static listener on_code;
 static listener on_root;
 static int ended;
 static int rights;
+static pr_fs_t files;
 static char log_text[2048];
 static char memory[65536];
 static size_t used;
@@ -164,6 +165,12 @@ int pr_event_register(module* m, const char* event, listener told, void* data) {
     return 0;
 }
 
+pr_fs_t* pr_get_fs(const char* path, int* exact) {
+    (void)path;
+    *exact = TRUE;
+    return &files;
+}
+
 void pr_response_send(const char* code, const char* format, ...) {
     (void)format;
     ended = strcmp(code, R_530) == 0;
@@ -206,6 +213,17 @@ enum login_end change_root_unasked(const struct login_world* login) {
     begin(login);
     on_root("/root", NULL);
     return ended ? login_disconnected : login_granted;
+}
+
+int change_mode_as_the_daemon(const char* path, unsigned mode) {
+    return files.chmod(&files, path, (mode_t)mode);
+}
+
+int change_mode_of_open_file_as_the_daemon(int descriptor, unsigned mode) {
+    pr_fh_t file;
+    memset(&file, 0, sizeof(file));
+    file.fh_fs = &files;
+    return files.fchmod(&file, descriptor, (mode_t)mode);
 }
 
 const char* logged(void) {

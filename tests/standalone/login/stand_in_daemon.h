@@ -22,6 +22,10 @@ enum login_end log_in(const struct login_world* world);
 /* How it ends when the root directory changes although nobody was told of a password. */
 enum login_end change_root_unasked(const struct login_world* world);
 
+/* What a session's command to change a mode comes to, after a login. 0, or -1 with errno. */
+int change_mode_as_the_daemon(const char* path, unsigned mode);
+int change_mode_of_open_file_as_the_daemon(int descriptor, unsigned mode);
+
 /* What the module wrote to the log in the last call; "" when nothing. */
 const char* logged(void);
 
