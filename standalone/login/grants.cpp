@@ -1,8 +1,10 @@
 #include "standalone/login/grants.h"
 
+#include "standalone/login/open_folder.h"
 #include "standalone/shares/share_access.h"
 
 #include <algorithm>
+#include <map>
 
 namespace velt {
 namespace {
@@ -18,49 +20,80 @@ bool isStrictlyBelow(const std::filesystem::path& place, const std::filesystem::
     return !relative.empty() && *relative.begin() != "..";
 }
 
+bool contains(const std::filesystem::path& outer, const std::filesystem::path& place) {
+    return place == outer || isStrictlyBelow(place, outer);
+}
+
 } // namespace
 
 Grants::Grants(const Identity& user, const std::vector<ShareEntry>& shares) : user_(user) {
     for (const ShareEntry& share : shares) {
-        std::error_code error;
-        auto place = std::filesystem::weakly_canonical(share.path, error);
-        if (error) {
-            place = std::filesystem::path(share.path).lexically_normal();
-        }
-        known_.push_back({&share, std::move(place)});
+        const Walk way = walk(share.path);
+        const auto reached = placeOf(way.folder);
+        const bool found = reached && way.ended;
+        known_.push_back({&share, found ? *reached : reached.valueOr("/") / way.rest, found});
     }
     std::ranges::stable_sort(
         known_, {}, [](const Known& known) { return std::distance(known.place.begin(), known.place.end()); });
 }
 
-Access Grants::on(const ShareEntry& share) const {
+std::optional<Access> Grants::told(const ShareEntry& share) const {
     const auto access = accessOf(user_, share);
-    return access ? access->value_or(Access::none) : Access::none;
+    return access ? *access : Access::none;
+}
+
+Access Grants::on(const ShareEntry& share) const {
+    const auto self = std::ranges::find(known_, &share, &Known::share);
+    Access access = told(share).value_or(Access::none);
+    for (const Known& known : known_) {
+        if (known.share != &share && contains(known.place, self->place)) {
+            access = std::min(access, told(*known.share).value_or(access));
+        }
+    }
+    return access;
 }
 
 Access Grants::leastAt(const std::filesystem::path& place, const std::filesystem::path& outer,
                        Access access) const {
     for (const Known& known : known_) {
-        if (isStrictlyBelow(known.place, outer) &&
-            (place == known.place || isStrictlyBelow(place, known.place))) {
-            access = std::min(access, on(*known.share));
+        if (isStrictlyBelow(known.place, outer) && contains(known.place, place)) {
+            access = std::min(access, told(*known.share).value_or(Access::none));
         }
     }
     return access;
 }
 
 std::vector<Restriction> Grants::restrictionsBelow(const std::filesystem::path& place, Access access) const {
-    std::vector<Restriction> restrictions;
+    std::map<std::filesystem::path, Access> restrictions; // an outer one comes before those in it
     for (const Known& known : known_) {
-        std::error_code error;
-        if (!isStrictlyBelow(known.place, place) || !std::filesystem::is_directory(known.place, error)) {
+        if (!known.found || !isStrictlyBelow(known.place, place)) {
             continue;
         }
-        if (const Access here = on(*known.share); here < access) {
-            restrictions.push_back({within(known.place, place), here});
+        const auto folder = within(known.place, place);
+        std::filesystem::path way;
+        for (const auto& part : folder.parent_path()) {
+            way /= part;
+            restrictions.emplace(way, access);
+        }
+        Access& here = restrictions.emplace(folder, access).first->second;
+        here = std::min(here, told(*known.share).value_or(Access::none));
+    }
+    std::vector<Restriction> all;
+    all.reserve(restrictions.size());
+    for (const auto& [folder, granted] : restrictions) {
+        all.push_back({folder, granted});
+    }
+    return all;
+}
+
+std::vector<std::string> Grants::missingBelow(const std::filesystem::path& place) const {
+    std::vector<std::string> names;
+    for (const Known& known : known_) {
+        if (!known.found && isStrictlyBelow(known.place, place)) {
+            names.push_back(known.share->name);
         }
     }
-    return restrictions;
+    return names;
 }
 
 } // namespace velt

@@ -5,35 +5,46 @@
 #include "standalone/login/view_mounts.h"
 #include "standalone/shares/share_entry.h"
 
+#include <optional>
+#include <string>
 #include <vector>
 
 namespace velt {
 
 /// A share may lie within another one. It can then take away from what the outer one grants, but not add to
-/// it. Folders are compared by their paths without symbolic links; if a folder is mounted in two places, only
-/// the share's own path counts.
+/// it. Folders are compared by their places: the paths that nobody but root can lead elsewhere. If a folder
+/// is mounted in two places, only the share's own path counts.
 class Grants {
 public:
     /// Both must outlive this.
     Grants(const Identity& user, const std::vector<ShareEntry>& shares);
 
     /// What the store grants or the file system allows, whichever is less; none when the store says nothing
-    /// or the check fails.
+    /// or the check fails. Shares around it for which the store says something can take from it.
     Access on(const ShareEntry& share) const;
 
-    /// `access`, limited by the shares below the folder `outer` that contain the folder `place`. Both paths
-    /// are without links.
+    /// `access`, limited by the shares below the folder `outer` that contain the folder `place`.
     Access leastAt(const std::filesystem::path& place, const std::filesystem::path& outer,
                    Access access) const;
 
-    /// The shares below `place` to which the user has less than `access`.
+    /// What has to be mounted within `place`, which is shown with `access`, so that the shares in it keep
+    /// their grants: they themselves, and the folders on the way to them, which can then be neither moved nor
+    /// removed, whoever the user is.
     std::vector<Restriction> restrictionsBelow(const std::filesystem::path& place, Access access) const;
+
+    /// The shares below `place` whose folders are not there. Who could write to it could bring others there
+    /// under their grants, and would be held by none in the right ones, wherever these are now.
+    std::vector<std::string> missingBelow(const std::filesystem::path& place) const;
 
 private:
     struct Known {
         const ShareEntry* share;
-        std::filesystem::path place; ///< without links, as far as it exists
+        std::filesystem::path place;
+        bool found; ///< else the place is where it should be
     };
+
+    /// Nothing when the store says nothing.
+    std::optional<Access> told(const ShareEntry& share) const;
 
     const Identity& user_;
     std::vector<Known> known_; ///< outer ones come first

@@ -54,6 +54,10 @@ public:
     std::vector<std::string> remarks;
 
 private:
+    /// The access, at most reading while the folder of a share below the place is missing.
+    Access limitedByMissing(const std::filesystem::path& place, Access access);
+    /// The folder with this access, and what the shares in it need.
+    VisibleFolder visible(OpenedFolder folder, Access access);
     /// Shows the folder with this access, limited by the shares between it and `outer`.
     Result<> showOne(OpenedFolder folder, const std::filesystem::path& outer, Access access);
     Result<> addShare(SideBySide& view, const ShareEntry& share, Access access);
@@ -64,19 +68,29 @@ private:
     Grants grants_;
 };
 
+Access ViewMaker::limitedByMissing(const std::filesystem::path& place, Access access) {
+    for (const std::string& share : grants_.missingBelow(place)) {
+        remarks.push_back("The folder of the share " + share +
+                          " is missing; until it is back, nobody writes to " + place.string() + ".");
+        access = std::min(access, Access::read);
+    }
+    return access;
+}
+
+VisibleFolder ViewMaker::visible(OpenedFolder folder, Access access) {
+    return {std::move(folder.fd), access, grants_.restrictionsBelow(folder.place, access)};
+}
+
 Result<> ViewMaker::showOne(OpenedFolder folder, const std::filesystem::path& outer, Access access) {
     access = grants_.leastAt(folder.place, outer, access);
     if (access == Access::none) {
         return refuse("The shares grant the user no access to " + folder.place.string() + ".");
     }
-    return showFolder(root_, {std::move(folder.fd), access, grants_.restrictionsBelow(folder.place, access)});
+    return showFolder(root_, visible(std::move(folder), access));
 }
 
 Result<> ViewMaker::showHome() {
     VELT_ASSIGN_OR_RETURN(auto home, openFolderAs(login_.user, login_.home));
-    if (home.place == "/") {
-        return refuse("The user's home is \"/\", the whole server.");
-    }
     // Shares around the home do not count, since it is the user's own; a share that is the home does.
     const auto outer = home.place.parent_path();
     return showOne(std::move(home), outer, Access::write);
@@ -97,13 +111,14 @@ Result<> ViewMaker::showInShare(const std::string& path) {
     if (end < path.size()) {
         VELT_ASSIGN_OR_RETURN(folder, openFolderBelow(login_.user, folder.fd, path.substr(end + 1)));
     }
-    return showOne(std::move(folder), outer, access);
+    const Access limited = limitedByMissing(folder.place, access);
+    return showOne(std::move(folder), outer, limited);
 }
 
 Result<> ViewMaker::addShare(SideBySide& view, const ShareEntry& share, Access access) {
     VELT_ASSIGN_OR_RETURN(auto folder, openFolderAs(login_.user, share.path));
-    return view.add(share.name,
-                    {std::move(folder.fd), access, grants_.restrictionsBelow(folder.place, access)});
+    access = limitedByMissing(folder.place, access);
+    return view.add(share.name, visible(std::move(folder), access));
 }
 
 Result<> ViewMaker::showShares() {

@@ -11,7 +11,10 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
+#include <array>
 #include <cerrno>
+#include <climits>
+#include <iterator>
 
 namespace velt {
 namespace {
@@ -62,6 +65,40 @@ Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& 
     return cannot("open", placeOf(folder).valueOr({}) / path, error);
 }
 
+bool onlyRootChanges(const UniqueFd& folder) {
+    struct stat status {};
+    return fstat(folder.get(), &status) == 0 && status.st_uid == 0 &&
+           (status.st_mode & (S_IWGRP | S_IWOTH)) == 0;
+}
+
+std::filesystem::path withoutFirst(const std::filesystem::path& path) {
+    std::filesystem::path rest;
+    for (auto part = std::next(path.begin()); part != path.end(); ++part) {
+        rest /= *part;
+    }
+    return rest;
+}
+
+/// Replaces the link that `name` is in the walk's folder, and that comes next, by what it says.
+Result<> followLink(Walk& walk, const std::filesystem::path& name) {
+    const auto place = placeOf(walk.folder).valueOr({}) / name;
+    if (!onlyRootChanges(walk.folder)) {
+        return Error(ErrorNumber::invalid,
+                     place.string() + " is a symbolic link that root need not have made.");
+    }
+    std::array<char, PATH_MAX> target{};
+    const ssize_t size = readlinkat(walk.folder.get(), name.c_str(), target.data(), target.size());
+    if (size <= 0 || size == static_cast<ssize_t>(target.size())) {
+        return cannot("open", place);
+    }
+    const std::filesystem::path path(std::string(target.data(), static_cast<std::size_t>(size)));
+    if (path.is_absolute()) {
+        walk.folder = UniqueFd(open("/", asFolder));
+    }
+    walk.rest = path.relative_path() / withoutFirst(walk.rest);
+    return {};
+}
+
 /// Opens with the user's rights, and looks for the place without them again.
 template<class Open>
 Result<OpenedFolder> openAs(const Identity& user, const std::filesystem::path& path, Open&& open) {
@@ -81,8 +118,36 @@ Result<UniqueFd> openFolder(const std::filesystem::path& path) {
     return folder ? Result<UniqueFd>(std::move(folder)) : cannot("open", path);
 }
 
+Walk walk(const std::filesystem::path& path) {
+    int links = 40; // at most, as for the kernel
+    Walk walk{UniqueFd(open("/", asFolder)), path.relative_path(), {}};
+    while (walk.ended && !walk.rest.empty()) {
+        const std::filesystem::path name = *walk.rest.begin();
+        UniqueFd next(openat(walk.folder.get(), name.empty() ? "." : name.c_str(), asFolder | O_NOFOLLOW));
+        if (next) {
+            walk.folder = std::move(next);
+            walk.rest = withoutFirst(walk.rest);
+            continue;
+        }
+        const int error = errno;
+        struct stat status {};
+        const bool isLink = fstatat(walk.folder.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 &&
+                            S_ISLNK(status.st_mode);
+        walk.ended = isLink && links-- > 0 ? followLink(walk, name) : cannot("open", path, error);
+    }
+    return walk;
+}
+
 Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::path& path) {
-    return openAs(user, path, [&] { return openFolder(path); });
+    VELT_ASSIGN_OR_RETURN(auto opened, openAs(user, path, [&]() -> Result<UniqueFd> {
+                              Walk way = walk(path);
+                              VELT_RETURN_IF_ERROR(way.ended);
+                              return std::move(way.folder);
+                          }));
+    if (opened.place == "/") {
+        return Error(ErrorNumber::invalid, path.string() + " is the whole server.");
+    }
+    return opened;
 }
 
 Result<OpenedFolder> openFolderBelow(const Identity& user, const UniqueFd& folder,

@@ -17,11 +17,21 @@ struct OpenedFolder {
     std::filesystem::path place; ///< see placeOf
 };
 
-/// With root's rights; follows symbolic links.
+/// With root's rights; follows symbolic links. For folders of the system's own.
 Result<UniqueFd> openFolder(const std::filesystem::path& path);
 
-/// With the user's rights; follows symbolic links. For a path that the user may have made: a home, or a share
-/// within a writable one.
+/// How far an absolute path leads.
+struct Walk {
+    UniqueFd folder;            ///< the last one on the way
+    std::filesystem::path rest; ///< what is left of the path, links replaced; "" when the walk got to its end
+    Result<> ended;             ///< why it did not
+};
+
+/// Follows only symbolic links in folders that root owns and nobody else may change: anybody who may write to
+/// a folder may put a link there, and so name another place.
+Walk walk(const std::filesystem::path& path);
+
+/// The end of such a walk, with the user's rights. An error for "/", the whole server.
 Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::path& path);
 
 /// With the user's rights, and never outside `folder`, even while folders and links are being moved. `path`

@@ -12,7 +12,8 @@
 
 namespace velt {
 
-/// A folder within a visible one to which there is less access.
+/// A folder within a visible one that can be neither moved nor removed there, and to which there may be less
+/// access.
 struct Restriction {
     std::filesystem::path place;  ///< relative to the visible folder, without links; outer ones come first
     Access access = Access::none; ///< none: it looks empty

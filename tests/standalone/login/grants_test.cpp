@@ -50,7 +50,7 @@ TEST_F(GrantsTest, ofAnInnerShareTakeFromThoseOfTheOuter) {
     share("outer/inner", Access::read);
     share("outer", Access::write);
     share("outer/closed", Access::none);
-    EXPECT_EQ(restrictionsBelow("outer"), "inner read, closed none");
+    EXPECT_EQ(restrictionsBelow("outer"), "closed none, inner read");
     EXPECT_EQ(restrictionsBelow("outer/inner"), "");
 }
 
@@ -58,9 +58,38 @@ TEST_F(GrantsTest, ofAnInnerShareAddNothing) {
     share("outer", Access::read);
     share("outer/inner", Access::write);
     const Grants grants(user_, shares_);
-    EXPECT_EQ(grants.on(shares_[1]), Access::write);
+    EXPECT_EQ(grants.on(shares_[1]), Access::read);
     EXPECT_EQ(grants.leastAt(top_ / "outer/inner", top_ / "outer", Access::read), Access::read);
     EXPECT_EQ(grants.leastAt(top_ / "outer/inner", top_ / "outer", Access::write), Access::write);
+}
+
+TEST_F(GrantsTest, ofAnOuterShareThatSaysNothingTakeNothing) {
+    share("outer", Access::write);
+    shares_[0].users.clear();
+    share("outer/inner", Access::write);
+    EXPECT_EQ(Grants(user_, shares_).on(shares_[1]), Access::write);
+}
+
+TEST_F(GrantsTest, pinTheFoldersOnTheWay) {
+    fs::create_directories(top_ / "outer/a/b/deep");
+    share("outer", Access::write);
+    share("outer/a/b/deep", Access::write);
+    share("outer/a/b", Access::read);
+    EXPECT_EQ(restrictionsBelow("outer"), "a write, a/b read, a/b/deep read")
+        << "the file system does not let her write to the last one";
+}
+
+TEST_F(GrantsTest, tellWhichFoldersAreMissing) {
+    share("outer", Access::write);
+    share("outer/absent", Access::none);
+    share("outer/inner", Access::write);
+    fs::create_directory_symlink("inner", top_ / "outer/link");
+    share("outer/link/below", Access::write);
+    const Grants grants(user_, shares_);
+    EXPECT_EQ(grants.missingBelow(top_ / "outer"), (std::vector<std::string>{"s1", "s3"}))
+        << "anybody may have made the link";
+    EXPECT_EQ(grants.missingBelow(top_ / "outer/inner"), std::vector<std::string>());
+    EXPECT_EQ(restrictionsBelow("outer"), "inner write");
 }
 
 TEST_F(GrantsTest, holdWhereALinkLeadsToTheShare) {

@@ -69,6 +69,33 @@ TEST_F(OpenFolder, belowHasTheRightsOfTheLogin) {
     EXPECT_EQ(getgroups(0, nullptr), 0);
 }
 
+TEST_F(OpenFolder, followsOnlyLinksThatRootMade) {
+    const auto leadsTo = [&](const fs::path& path) {
+        const auto folder = openFolderAs(user_, path);
+        return folder ? folder->place : fs::path("(refused)");
+    };
+    fs::create_directory_symlink("below/deep", share_ / "relative");
+    fs::create_directory_symlink(share_ / "below", share_ / "absolute");
+    fs::create_directory_symlink("../share/absolute/deep/.", share_ / "chain");
+    fs::create_directory_symlink("round", share_ / "round");
+    for (const char* link : {"relative", "absolute/deep", "chain", "below/deep/", "below//deep"}) {
+        EXPECT_EQ(leadsTo(share_ / link), share_ / "below/deep") << link;
+    }
+    EXPECT_EQ(leadsTo(share_ / "round"), "(refused)");
+    EXPECT_EQ(leadsTo(share_ / "absent"), "(refused)");
+    EXPECT_EQ(leadsTo("/"), "(refused)");
+    fs::create_directory_symlink("/", share_ / "server");
+    EXPECT_EQ(leadsTo(share_ / "server"), "(refused)");
+    for (const fs::perms others : {fs::perms(0775), fs::perms(0757)}) {
+        fs::permissions(share_, others);
+        EXPECT_EQ(leadsTo(share_ / "relative"), "(refused)");
+        EXPECT_EQ(leadsTo(share_ / "below/deep"), share_ / "below/deep");
+    }
+    fs::permissions(share_, fs::perms(0755));
+    ASSERT_EQ(chown(share_.c_str(), 54321, 0), 0);
+    EXPECT_EQ(leadsTo(share_ / "relative"), "(refused)");
+}
+
 TEST_F(OpenFolder, exactlyFollowsNoLinks) {
     fs::create_directory_symlink("below", share_ / "alias");
     const auto share = openFolder(share_);
