@@ -16,11 +16,13 @@ std::optional<Access> grantToGroups(const ShareEntry& share, const std::vector<g
     std::optional<Access> best;
     for (const auto& [name, grant] : share.groups) {
         const std::optional<GroupEntry> group = groupByName(name);
-        if (!group || std::find(gids.begin(), gids.end(), group->gid) == gids.end()) {
-            continue;
-        }
-        if (grant == Access::none) {
+        const bool member = group && std::find(gids.begin(), gids.end(), group->gid) != gids.end();
+        // Who belongs to a group that cannot be looked up is not known: a refusal of it holds for all.
+        if (grant == Access::none && (member || !group)) {
             return grant;
+        }
+        if (!member) {
+            continue;
         }
         best = std::max(best, std::optional(grant));
     }

@@ -76,6 +76,17 @@ TEST_F(ShareAccessTest, WithoutAnEntryThereIsNone) {
     EXPECT_EQ(accessFor("staff"), noEntry);
 }
 
+TEST_F(ShareAccessTest, ARefusalToAGroupThatCannotBeLookedUpIsForAll) {
+    own(0777, 0, 0);
+    share_.groups["media"] = Access::write;
+    share_.groups["away"] = Access::read;
+    EXPECT_EQ(accessFor("anna"), readWrite);
+    share_.groups["away"] = Access::none;
+    EXPECT_EQ(accessFor("anna"), denied);
+    share_.users["anna"] = Access::read;
+    EXPECT_EQ(accessFor("anna"), readOnly) << "her own entry comes first";
+}
+
 TEST_F(ShareAccessTest, AnUnknownAccountHasNoneEvenWithAnEntry) {
     share_.users["ghost"] = Access::write;
     EXPECT_EQ(accessFor("ghost"), noEntry);
