@@ -108,8 +108,7 @@ bool isValid(const Json::Value& value, const Setting& setting) {
     if (!hasType(value, setting.type)) {
         return false;
     }
-    return setting.type != SettingType::number || setting.lenient ||
-           (value.asInt() >= setting.least && value.asInt() <= setting.most);
+    return setting.type != SettingType::number || schema::accepts(setting, value.asInt());
 }
 
 std::string expectationOf(const Setting& setting) {

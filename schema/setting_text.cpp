@@ -1,24 +1,38 @@
 #include "schema/setting_text.h"
 
-#include "base/number_text.h"
-
 namespace velt::schema {
 
 namespace {
 
-std::string rangeFacts(const Setting& setting) {
-    const std::string unit = setting.unit == nullptr ? "" : std::string(setting.unit) + ", ";
-    return unit + std::to_string(setting.least) + " to " + std::to_string(setting.most);
+std::string numberFacts(const Setting& setting) {
+    std::string facts;
+    for (const std::string& fact :
+         {std::string(setting.unit == nullptr ? "" : setting.unit), rangeText(setting)})
+        facts += fact.empty() ? "" : fact + ", ";
+    return facts;
+}
+
+std::string numberExpectation(const Setting& setting) {
+    const std::string range = rangeText(setting);
+    if (range.empty())
+        return "a number";
+    return (setting.most == highestNumber ? "a number, " : "a number from ") + range;
 }
 
 } // namespace
+
+std::string rangeText(const Setting& setting) {
+    if (setting.most != highestNumber)
+        return std::to_string(setting.least) + " to " + std::to_string(setting.most);
+    return setting.least == lowestNumber ? "" : std::to_string(setting.least) + " or more";
+}
 
 std::string expectation(const Setting& setting, BooleanWords words) {
     switch (setting.type) {
     case SettingType::boolean:
         return words.either;
     case SettingType::number:
-        return numberText(setting.least, setting.most);
+        return numberExpectation(setting);
     case SettingType::text:
         break;
     }
@@ -30,7 +44,7 @@ std::string valueFacts(const Setting& setting, BooleanWords words) {
     case SettingType::boolean:
         return words.either + std::string(", default ") + (setting.number != 0 ? words.on : words.off);
     case SettingType::number:
-        return rangeFacts(setting) + ", default " + std::to_string(setting.number);
+        return numberFacts(setting) + "default " + std::to_string(setting.number);
     case SettingType::text:
         break;
     }

@@ -18,10 +18,13 @@ struct BooleanWords {
 inline constexpr BooleanWords onOff{"on", "off", "on or off"};
 inline constexpr BooleanWords zeroOne{"1", "0", "0 or 1"};
 
-/// What a value has to be: "a number from 1 to 65535", "on or off".
+/// The numbers that are meant: "1 to 65535", "0 or more"; "" where all are.
+std::string rangeText(const Setting& setting);
+
+/// What a value has to be: "a number from 1 to 65535", "a number, 0 or more", "on or off".
 std::string expectation(const Setting& setting, BooleanWords words);
 
-/// What there is to know about the values: "seconds, 0 to 2147483647, default 300".
+/// What there is to know about the values: "seconds, 0 to 86400, default 300".
 std::string valueFacts(const Setting& setting, BooleanWords words);
 
 } // namespace velt::schema

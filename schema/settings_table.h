@@ -18,16 +18,23 @@ inline constexpr std::int64_t highestPort = 65535;
 inline constexpr std::int64_t highestNumber = INT32_MAX;
 inline constexpr std::int64_t lowestNumber = INT32_MIN;
 
+/// What becomes of a number outside a setting's range.
+enum class OutOfRange {
+    refused,
+    acceptedAbove, ///< refused below the range
+    accepted,      ///< without effect
+};
+
 /// One setting, as the API and the command line show it, as its file stores it, or both.
 struct Setting {
     const char* key = nullptr;     ///< in the API and on the command line; null: not served
     const char* fileKey = nullptr; ///< in the settings file; null: not stored there, or under other keys
     SettingType type = SettingType::boolean;
-    const char* meaning = "";   ///< a sentence without a full stop
-    const char* unit = nullptr; ///< of a number
-    std::int64_t least = 0;     ///< of a number
-    std::int64_t most = highestNumber;
-    bool lenient = false;          ///< numbers out of the range are stored, too, and have no effect
+    const char* meaning = "";          ///< a sentence without a full stop
+    const char* unit = nullptr;        ///< of a number
+    std::int64_t least = 0;            ///< of a number; lowestNumber: any
+    std::int64_t most = highestNumber; ///< highestNumber: any
+    OutOfRange outOfRange = OutOfRange::refused;
     std::int64_t number = 0;       ///< the default of a number; of a boolean 0 or 1
     const char* text = "";         ///< the default of a text
     const char* form = "a text";   ///< what a text looks like
@@ -35,6 +42,14 @@ struct Setting {
     int apiVersion = 0;            ///< the only version of the API that has the key; 0: each has it
     const char* service = nullptr; ///< the service that a boolean switches on and off
 };
+
+/// Whether the setting can have the number.
+constexpr bool accepts(const Setting& setting, std::int64_t number) {
+    if (setting.outOfRange == OutOfRange::accepted)
+        return true;
+    return number >= setting.least &&
+           (number <= setting.most || setting.outOfRange == OutOfRange::acceptedAbove);
+}
 
 inline constexpr Setting ftpSettings[] = {
     {.key = "enable_ftp", .meaning = "Plain FTP runs", .service = "ftp"},
@@ -48,6 +63,8 @@ inline constexpr Setting ftpSettings[] = {
      .type = SettingType::number,
      .meaning = "Idle time after which a session ends; 0 is never",
      .unit = "seconds",
+     .most = 86400,
+     .outOfRange = OutOfRange::acceptedAbove,
      .number = 300},
     {.key = "portnum",
      .fileKey = "port",
@@ -66,12 +83,12 @@ inline constexpr Setting ftpSettings[] = {
      .type = SettingType::number,
      .meaning = "First port for passive transfers; 0 is the default range, 55536 to 55899",
      .most = highestPort,
-     .lenient = true},
+     .outOfRange = OutOfRange::accepted},
     {.fileKey = "passive_port_max",
      .type = SettingType::number,
      .meaning = "Last port for passive transfers; 0 is the default range",
      .most = highestPort,
-     .lenient = true},
+     .outOfRange = OutOfRange::accepted},
     {.key = "use_ext_ip", .fileKey = "use_ext_ip", .meaning = "Passive mode announces the external address"},
     {.key = "ext_ip",
      .type = SettingType::text,
@@ -104,18 +121,18 @@ inline constexpr Setting ftpSettings[] = {
      .type = SettingType::number,
      .meaning = "Upload limit of a session; 0 is none",
      .unit = "KB/s of 1024 bytes",
-     .lenient = true},
+     .outOfRange = OutOfRange::accepted},
     {.key = "maxdownloadrate",
      .fileKey = "maxdownloadrate",
      .type = SettingType::number,
      .meaning = "Download limit of a session; 0 is none",
      .unit = "KB/s of 1024 bytes",
-     .lenient = true},
+     .outOfRange = OutOfRange::accepted},
     {.key = "max_conn_per_ip",
      .fileKey = "max_conn_per_ip",
      .type = SettingType::number,
      .meaning = "Connections from one client address; 0 is no limit",
-     .lenient = true},
+     .outOfRange = OutOfRange::accepted},
     {.fileKey = "reserved",
      .type = SettingType::number,
      .meaning = "Kept unchanged for other programs",

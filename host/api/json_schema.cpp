@@ -44,8 +44,9 @@ std::string integerWords(const Json::Value& schema) {
     if (schema.isMember("minimum") && schema.isMember("maximum")) {
         return "an integer from " + schema["minimum"].asString() + " to " + schema["maximum"].asString();
     }
-    return schema.isMember("minimum") ? "an integer of at least " + schema["minimum"].asString()
-                                      : "an integer";
+    return schema.isMember("minimum") && !schema.isMember("x-expected")
+               ? "an integer of at least " + schema["minimum"].asString()
+               : "an integer";
 }
 
 std::string wordsFor(const Json::Value& schema) {
@@ -88,6 +89,18 @@ Json::Value flatSchema(const Json::Value& document, const Json::Value& part) {
         }
     }
     return flat;
+}
+
+Json::Value withBounds(Json::Value schema) {
+    if (schema.isObject() && schema.get("format", "") == "int32") {
+        schema.removeMember("format");
+        schema["minimum"] = schema.get("minimum", Json::Value::minInt);
+        schema["maximum"] = schema.get("maximum", Json::Value::maxInt);
+    }
+    for (Json::Value& each : schema) {
+        each = withBounds(each);
+    }
+    return schema;
 }
 
 std::string expectationOf(const Json::Value& schema, const std::vector<std::string>& path) {

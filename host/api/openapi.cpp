@@ -90,7 +90,7 @@ OpenApi::OpenApi() : text_(openApiDocument), schemas_(std::make_unique<Schemas>(
         auto body = std::make_unique<Schemas::Body>();
         body->source = request["content"]["application/json"]["schema"];
         valijson::SchemaParser parser;
-        parser.populateSchema(Adapter(body->source), body->compiled);
+        parser.populateSchema(Adapter(withBounds(body->source)), body->compiled);
         schemas_->byPath.emplace(path, std::move(body));
     }
 }

@@ -28,12 +28,8 @@ Error refuseValue(const char* services, const Setting& setting, const std::strin
                   schema::expectation(setting, schema::zeroOne) + ".");
 }
 
-bool isInRange(std::int64_t number, const Setting& setting) {
-    return setting.lenient || (number >= setting.least && number <= setting.most);
-}
-
 Result<> checkValue(const char* services, const Setting& setting, std::int32_t number) {
-    if (setting.type == SettingType::number && !isInRange(number, setting))
+    if (setting.type == SettingType::number && !schema::accepts(setting, number))
         return refuseValue(services, setting, std::to_string(number));
     return {};
 }
@@ -51,7 +47,7 @@ Result<> checkValue(const char* services, const Setting& setting, std::span<char
     if (setting.type != SettingType::number)
         return {};
     const auto number = parseNumber(text);
-    if (!number || std::to_string(*number) != text || !isInRange(*number, setting))
+    if (!number || std::to_string(*number) != text || !schema::accepts(setting, *number))
         return refuseValue(services, setting, quotedText(text));
     return {};
 }

@@ -203,7 +203,7 @@ TEST_F(SettingsTest, AValueOfTheWrongTypeAsksNothing) {
 
 TEST_F(SettingsTest, ANumberOutOfItsRangeAsksNothing) {
     EXPECT_EQ(run({"ftp", "set", "timeout=-5"}).err,
-              "veltctl: timeout: expected a number from 0 to 2147483647.\n"
+              "veltctl: timeout: expected a number from 0 to 86400.\n"
               "What to do: Run 'veltctl ftp set --help' for all settings.\n");
     for (const char* word : {"portnum=0", "portnum=65536", "utf8_mode=3", "timeout=2147483648"}) {
         EXPECT_EQ(run({"ftp", "set", word}).code, 2) << word;
@@ -215,8 +215,7 @@ TEST_F(SettingsTest, ANumberOutOfItsRangeAsksNothing) {
 TEST_F(SettingsTest, HelpHasTheFactsOfEachSetting) {
     const std::string help = run({"ftp", "set", "--help"}).out;
     for (const char* line :
-         {"  timeout                 Idle time after which a session ends; 0 is never (seconds, 0 to "
-          "2147483647, "
+         {"  timeout                 Idle time after which a session ends; 0 is never (seconds, 0 to 86400, "
           "default 300)\n",
           "  portnum                 Port of FTP and FTPS (1 to 65535, default 21)\n",
           "  enable_fxp              Transfers between two servers are allowed (on or off, default off)\n",

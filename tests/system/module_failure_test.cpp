@@ -56,7 +56,7 @@ TEST_F(ModuleFailure, saysWhyAnotherValueIsRefused) {
         R"({"ext_ip": "eth0"})", operationFailed,
         "The external address is \"eth0\"; expected an IPv4 address such as 192.0.2.1, or nothing.");
     expectRefusal(R"({"timeout": -5})", operationFailed,
-                  "The FTP setting timeout is -5; expected a number from 0 to 2147483647.");
+                  "The FTP setting timeout is -5; expected a number from 0 to 86400.");
     EXPECT_EQ(getFtp()["ext_ip"], "");
 }
 

@@ -1,5 +1,6 @@
 // The description of the API against the module's table, its decisions and its answers.
 
+#include "host/api/json_schema.h"
 #include "host/api/openapi.h"
 #include "host/base/json.h"
 #include "tests/host/fake_standalone.h"
@@ -24,7 +25,7 @@ const std::string ftp = "VELT.Core.FileServ.FTP";
 /// Why the value is not as the schema says; "" when it is.
 std::string violation(const Json::Value& schema, const Json::Value& value) {
     valijson::Schema compiled;
-    valijson::SchemaParser().populateSchema(JsonCppAdapter(schema), compiled);
+    valijson::SchemaParser().populateSchema(JsonCppAdapter(velt::host::withBounds(schema)), compiled);
     valijson::Validator validator(valijson::Validator::kStrongTypes);
     valijson::ValidationResults results;
     validator.validate(compiled, JsonCppAdapter(value), &results);
@@ -107,8 +108,9 @@ protected:
 
     /// Whether the value is a number that the module takes, though no service does.
     static bool isOutOfRange(const Json::Value& value, const Json::Value& property) {
-        return value.isInt() && property.isMember("minimum") &&
-               (value.asInt() < property["minimum"].asInt() || value.asInt() > property["maximum"].asInt());
+        return value.isInt() &&
+               ((property.isMember("minimum") && value.asInt() < property["minimum"].asInt()) ||
+                (property.isMember("maximum") && value.asInt() > property["maximum"].asInt()));
     }
 
     /// Every value that a parameter is tried with, right and wrong.

@@ -80,7 +80,7 @@ TEST_F(HostRows, EveryWrongFieldIsNamed) {
         errors[each["field"].asString()] = each["expected"].asString();
     }
     const std::map<std::string, std::string> expected{{"enable_ftp", "true or false"},
-                                                      {"timeout", "an integer from 0 to 2147483647"},
+                                                      {"timeout", "an integer: 0 to 86400"},
                                                       {"utf8_mode", "an integer from 0 to 2"}};
     EXPECT_EQ(errors, expected);
 }

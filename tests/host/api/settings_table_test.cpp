@@ -1,7 +1,7 @@
 // The table of the settings, the description of the API and the module say the same.
 #include "host/api/json_schema.h"
 #include "host/base/json.h"
-#include "schema/settings_table.h"
+#include "schema/setting_text.h"
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -13,6 +13,19 @@ namespace {
 namespace schema = velt::schema;
 using schema::Setting;
 using schema::SettingType;
+
+/// The bounds that the server holds a number to; where it accepts more, also what is meant.
+void addBounds(const Setting& setting, Json::Value& facts) {
+    if (setting.outOfRange != schema::OutOfRange::accepted) {
+        facts["minimum"] = Json::Int64(setting.least);
+    }
+    if (setting.outOfRange == schema::OutOfRange::refused) {
+        facts["maximum"] = Json::Int64(setting.most);
+    } else {
+        facts["format"] = "int32";
+        facts["x-expected"] = schema::rangeText(setting);
+    }
+}
 
 /// What the description has to say of the setting.
 Json::Value describe(const Setting& setting) {
@@ -27,8 +40,7 @@ Json::Value describe(const Setting& setting) {
     case SettingType::number:
         facts["type"] = "integer";
         facts["default"] = Json::Int64(setting.number);
-        facts["minimum"] = Json::Int64(setting.least);
-        facts["maximum"] = Json::Int64(setting.most);
+        addBounds(setting, facts);
         break;
     case SettingType::text:
         facts["type"] = "string";

@@ -95,7 +95,7 @@ TEST_F(FtpContract, ARefusedRecordLeavesTheStoredOne) {
     EXPECT_LT(VELTFTPConfSet(conf), 0);
     EXPECT_EQ(VLIBCErrGet(), 0x0100);
     EXPECT_LT(VELTFTPTimeOutSet(-1), 0);
-    EXPECT_EQ(lastErrorSentence(), "The FTP setting timeout is -1; expected a number from 0 to 2147483647.");
+    EXPECT_EQ(lastErrorSentence(), "The FTP setting timeout is -1; expected a number from 0 to 86400.");
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), before);
     EXPECT_EQ(test::fakeCandidate().ftp.size(), 1U) << "the daemon is not asked about what is refused here";
 }

@@ -109,10 +109,10 @@ TEST(CheckFtp, TheRangeInForceIsApartFromThePort) {
 }
 
 TEST(CheckFtp, TheTimeOutIsNotNegative) {
-    for (const int seconds : {0, 1, INT_MAX})
+    for (const int seconds : {0, 1, 86400, 86401, INT_MAX})
         EXPECT_EQ(problemAfter([&](FtpSettings& settings) { settings.timeout = seconds; }), "");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) { settings.timeout = -5; }),
-              "The FTP setting timeout is -5; expected a number from 0 to 2147483647.");
+              "The FTP setting timeout is -5; expected a number from 0 to 86400.");
 }
 
 TEST(CheckFtp, LimitsBelowOneMeanNoLimit) {

@@ -13,10 +13,10 @@ constexpr const char* goldenFtp =
 # takes effect when the service starts next.
 version = 1
 
-# Services that run: 1 is FTP, 2 is FTPS, 3 is both (-2147483648 to 2147483647, default 0).
+# Services that run: 1 is FTP, 2 is FTPS, 3 is both (default 0).
 service_flags = 0
 
-# Idle time after which a session ends; 0 is never (seconds, 0 to 2147483647, default 300).
+# Idle time after which a session ends; 0 is never (seconds, 0 to 86400, default 300).
 timeout = 300
 
 # Port of FTP and FTPS (1 to 65535, default 21).
@@ -49,16 +49,16 @@ fips = 0
 # The limits maxuploadrate and maxdownloadrate are in force (0 or 1, default 0).
 enable_flow_ctrl = 0
 
-# Upload limit of a session; 0 is none (KB/s of 1024 bytes, 0 to 2147483647, default 0).
+# Upload limit of a session; 0 is none (KB/s of 1024 bytes, 0 or more, default 0).
 maxuploadrate = 0
 
-# Download limit of a session; 0 is none (KB/s of 1024 bytes, 0 to 2147483647, default 0).
+# Download limit of a session; 0 is none (KB/s of 1024 bytes, 0 or more, default 0).
 maxdownloadrate = 0
 
-# Connections from one client address; 0 is no limit (0 to 2147483647, default 0).
+# Connections from one client address; 0 is no limit (0 or more, default 0).
 max_conn_per_ip = 0
 
-# Kept unchanged for other programs (-2147483648 to 2147483647, default 0).
+# Kept unchanged for other programs (default 0).
 reserved = 0
 
 # Users are confined to their home folders (0 or 1, default 0).
@@ -205,10 +205,10 @@ TEST(SettingsFiles, DamageIsNamedByFileAndLine) {
         const char* to;
         const char* problem;
     } cases[] = {
-        {"timeout = 300", "timeout = 3oo", "line 9: timeout: expected a number from 0 to 2147483647"},
-        {"timeout = 300", "timeout =", "line 9: timeout: expected a number from 0 to 2147483647"},
-        {"timeout = 300", "timeout = 2147483648", "line 9: timeout: expected a number from 0 to 2147483647"},
-        {"timeout = 300", "timeout = +1", "line 9: timeout: expected a number from 0 to 2147483647"},
+        {"timeout = 300", "timeout = 3oo", "line 9: timeout: expected a number from 0 to 86400"},
+        {"timeout = 300", "timeout =", "line 9: timeout: expected a number from 0 to 86400"},
+        {"timeout = 300", "timeout = 2147483648", "line 9: timeout: expected a number from 0 to 86400"},
+        {"timeout = 300", "timeout = +1", "line 9: timeout: expected a number from 0 to 86400"},
         {"timeout = 300", "timeout 300", "line 9: expected \"key = value\""},
         {"timeout = 300", "= 300", "line 9: expected \"key = value\""},
         {"timeout = 300", "timeout = 300\ntime_out = 3", "line 10: unknown key \"time_out\""},
