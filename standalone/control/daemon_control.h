@@ -9,7 +9,7 @@
 
 namespace velt {
 
-/// Makes the daemon run with the stored settings, or stops it where its plan says so. A start, and a stop
+/// Makes the daemon run with the stored settings, or stops it where they give no plan. A start, and a stop
 /// that no start follows, end with followWithFirewall.
 Result<> startDaemon(const Daemon& daemon);
 

@@ -71,8 +71,12 @@ struct Daemon {
     /// Renders, tests and writes the configuration that follows from the stored settings, and all that it
     /// needs, such as keys. A configuration has a folder of its own, so that a daemon which runs with a
     /// former one can be started again with that one; what all of them read at logins is replaced atomically.
-    /// So this may be called while the daemon runs. Nothing when the settings say that it is not to run;
-    /// fails when they cannot be read, or the daemon's own test refuses them.
+    /// So this may be called while the daemon runs. Fails when the settings cannot be read, or the daemon's
+    /// own test refuses them.
+    ///
+    /// Whether the services are on is for the caller to ask: the contract starts a service by name, and SFTP
+    /// then runs although its setting is off. Nothing only where a daemon has nothing to serve with all of
+    /// them off, as FTP's; a start by name stops it then.
     Result<std::optional<DaemonPlan>> (*plan)();
 
     /// Puts the stored settings to the daemon's own test. Nothing that a running daemon uses is touched.

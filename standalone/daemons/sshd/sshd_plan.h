@@ -14,8 +14,8 @@ namespace velt {
 /// running daemon uses is touched.
 Result<> testSftpCandidate(const SftpSettings& settings);
 
-/// The plan that follows from the stored settings, see Daemon::plan: always one, also when they do not enable
-/// SFTP.
+/// The plan that follows from the stored settings, see Daemon::plan: always one, since SFTP may be started by
+/// name while its setting is off.
 Result<std::optional<DaemonPlan>> planSftpDaemon();
 
 } // namespace velt
