@@ -12,6 +12,7 @@
 #include "host/trial/trial.h"
 #include "standalone/standalone.h"
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <csignal>
@@ -117,6 +118,8 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
 } // namespace
 
 int main(int argc, char** argv) {
+    // What it makes is for others to read at most, whatever it was started with.
+    umask(022);
     const std::vector<std::string> words(argv + 1, argv + argc);
     if (!words.empty() && words[0] == "trial") {
         return velt::host::runTrial({words.begin() + 1, words.end()});

@@ -3,6 +3,7 @@
 #include "base/file.h"
 #include "base/json_value.h"
 #include "base/sha256.h"
+#include "base/trusted_file.h"
 #include "base/utc_text.h"
 #include "host/base/json.h"
 #include "host/base/random_text.h"
@@ -63,14 +64,16 @@ TokenStore::TokenStore(std::filesystem::path file) : file_(std::move(file)) {
 }
 
 void TokenStore::read() {
-    const auto text = readOptionalFile(file_);
-    if (!text) {
-        throw TokenError(text.error().message);
-    }
-    if (!*text) {
+    std::error_code unknown;
+    if (std::filesystem::symlink_status(file_, unknown).type() == std::filesystem::file_type::not_found) {
         return;
     }
-    const auto content = parseObject(**text);
+    const auto text = readTrusted(file_);
+    if (!text) {
+        throw TokenError("The token file " + text.error().message +
+                         " Correct that, or remove it and make new tokens.");
+    }
+    const auto content = parseObject(*text);
     const Json::Value list = content ? (*content)["tokens"] : Json::Value();
     bool good = list.isArray();
     for (Json::ArrayIndex i = 0; good && i < list.size(); ++i) {

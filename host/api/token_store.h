@@ -43,7 +43,8 @@ struct NewToken {
 /// Thread-safe.
 class TokenStore {
 public:
-    /// Reads the file, which may be missing. Throws TokenError when it is damaged: access is never guessed.
+    /// Reads the file, which may be missing. Throws TokenError when it is damaged, or when others than root
+    /// and the host's own user could have written it: access is never guessed.
     explicit TokenStore(std::filesystem::path file);
 
     /// Makes a token of 256 random bits. Throws TokenError, and makes none, when it cannot be stored.

@@ -9,8 +9,6 @@
 #include "host/trial/trial_veltd.h"
 #include "standalone/standalone.h"
 
-#include <sys/stat.h>
-
 #include <cstdio>
 #include <exception>
 
@@ -83,7 +81,6 @@ void stop(const TrialFolder& folder) {
 } // namespace
 
 int runTrial(const std::vector<std::string>& words) {
-    ::umask(022);
     std::setvbuf(stdout, nullptr, _IOLBF, 0); // keeps the order with standard error
     try {
         if (words.size() == 2 && words[0] == "start") {

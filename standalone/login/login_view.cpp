@@ -1,9 +1,9 @@
 #include "standalone/login/login_view.h"
 
+#include "base/trusted_file.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
-#include "standalone/core/trusted_file.h"
 #include "standalone/login/grants.h"
 #include "standalone/login/open_folder.h"
 #include "standalone/login/view_mounts.h"

@@ -6,12 +6,16 @@
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/host_service.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
 #include <csignal>
+#include <filesystem>
 #include <sstream>
 #include <thread>
 
 namespace velt::test {
+namespace fs = std::filesystem;
 namespace {
 
 class HostRecord : public HostService {
@@ -51,6 +55,26 @@ protected:
         EXPECT_TRUE(servesSftp(2222));
     }
 };
+
+TEST_F(HostRecord, othersMayWriteToNoFolderOfTheHostWhateverItWasStartedWith) {
+    ASSERT_EQ(stopHost(), 0);
+    std::error_code none;
+    fs::remove_all(worldRoot / "run", none);
+    fs::remove_all(worldRoot / "var/log", none);
+    const mode_t before = umask(0);
+    startHost();
+    umask(before);
+    done({"ftp", "set", "enable_ftp=on"});
+    std::string writable;
+    for (const fs::directory_entry& entry : fs::recursive_directory_iterator(worldRoot)) {
+        const auto others =
+            entry.symlink_status().permissions() & (fs::perms::group_write | fs::perms::others_write);
+        if (entry.is_directory() && !entry.is_symlink() && others != fs::perms::none) {
+            writable += entry.path().string() + "\n";
+        }
+    }
+    EXPECT_EQ(writable, "");
+}
 
 TEST_F(HostRecord, theLogNamesWhoAskedAndFromWhere) {
     done({"ftp", "set", "enable_ftp=on"});

@@ -311,6 +311,39 @@ TEST_F(HostAccess, ADamagedTokenFileStopsTheStart) {
     EXPECT_THROW(start(), velt::host::TokenError) << "a folder";
 }
 
+TEST_F(HostAccess, ATokenFileThatOthersCouldHaveWrittenStopsTheStart) {
+    start();
+    stop();
+    const auto refusal = [this]() -> std::string {
+        try {
+            start();
+        } catch (const velt::host::TokenError& error) {
+            return error.what();
+        }
+        stop();
+        return "";
+    };
+    const std::string file = settings.tokenFile.string();
+    const std::string advice = " Correct that, or remove it and make new tokens.";
+    for (const mode_t mode : {0620U, 0602U, 0666U}) {
+        ASSERT_EQ(chmod(file.c_str(), mode), 0);
+        EXPECT_EQ(refusal(), "The token file " + file +
+                                 " belongs to another account, or other accounts may write to it." + advice)
+            << mode;
+    }
+    ASSERT_EQ(chmod(file.c_str(), 0600), 0);
+    const auto target = folder / "planted.json";
+    std::filesystem::rename(file, target);
+    std::filesystem::create_symlink(target, file);
+    EXPECT_NE(refusal(), "") << "a link";
+    std::filesystem::rename(target, file);
+    EXPECT_EQ(refusal(), "");
+    if (geteuid() == 0) {
+        ASSERT_EQ(chown(file.c_str(), 54321, 54321), 0);
+        EXPECT_NE(refusal(), "") << "of another account";
+    }
+}
+
 TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
     start();
     const auto parent = settings.tokenFile.parent_path();

@@ -1,6 +1,6 @@
-// The files that decide what a login may see.
-#ifndef VELT_STANDALONE_CORE_TRUSTED_FILE_H
-#define VELT_STANDALONE_CORE_TRUSTED_FILE_H
+// Files that decide what somebody may do.
+#ifndef VELT_BASE_TRUSTED_FILE_H
+#define VELT_BASE_TRUSTED_FILE_H
 
 #include "base/result.h"
 

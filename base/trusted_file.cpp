@@ -1,7 +1,6 @@
-#include "standalone/core/trusted_file.h"
+#include "base/trusted_file.h"
 
 #include "base/file.h"
-#include "standalone/core/error_number.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -15,7 +14,7 @@ namespace {
 constexpr off_t longestFile = off_t{16} << 20;
 
 Error refuse(const std::filesystem::path& path, const std::string& why) {
-    return {ErrorNumber::store, path.string() + " " + why + "."};
+    return Error(path.string() + " " + why + ".");
 }
 
 } // namespace

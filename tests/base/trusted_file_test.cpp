@@ -1,4 +1,4 @@
-#include "standalone/core/trusted_file.h"
+#include "base/trusted_file.h"
 
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
