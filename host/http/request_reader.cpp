@@ -15,6 +15,15 @@ namespace http = boost::beast::http;
 
 constexpr std::size_t firstBufferSize = std::size_t{8} * 1024;
 
+/// "0", and the ends of its line and of the body: what every chunked body ends with.
+constexpr std::size_t shortestLastChunk = 5;
+
+/// Whether a name or an address is followed by nothing but a port.
+bool isHost(boost::beast::string_view host) {
+    const std::size_t end = host.find(']');
+    return end == host.npos || end + 1 == host.size() || host[end + 1] == ':';
+}
+
 std::string text(boost::beast::string_view view) {
     return {view.data(), view.size()};
 }
@@ -98,7 +107,8 @@ RequestReader::Step RequestReader::readHead() {
             return refuse(400, "A header line does not end in CR LF.");
         }
         if (lineEnd >= 3 && head[lineEnd - 2] == '\n') {
-            return lineEnd < headLimit_ ? checkHead() : refuse(431, "The request header is too large.");
+            return lineEnd < headLimit_ ? checkHead(lineEnd + 1)
+                                        : refuse(431, "The request header is too large.");
         }
         // Programs disagree about what a continued line means.
         if (lineEnd + 1 < size && (head[lineEnd + 1] == ' ' || head[lineEnd + 1] == '\t')) {
@@ -114,38 +124,42 @@ RequestReader::Step RequestReader::readHead() {
     return size >= headLimit_ ? refuse(431, "The request header is too large.") : Step::needMore;
 }
 
-RequestReader::Step RequestReader::checkHead() {
+// The head alone: the parser adds the trailers of a body to the fields, and a client's word about itself is
+// taken only where access is checked.
+RequestReader::Step RequestReader::checkHead(std::size_t size) {
     auto& parser = *parser_->http;
     boost::beast::error_code error;
-    begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
+    begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, size), error);
     headDone_ = true;
     const bool tooLarge = error == http::error::body_limit;
-    const bool malformed = error && error != http::error::need_more && !tooLarge;
-    if (malformed && !parser.is_header_done()) {
+    if (error && error != http::error::need_more && !tooLarge) {
         return error == http::error::bad_version ? refuse(505, "Only HTTP/1.0 and HTTP/1.1 are supported.")
                                                  : refuse(400, "The request is not well-formed HTTP.");
     }
     // Reported later: access is checked first.
-    refusal_ = faultOfHead(tooLarge, malformed);
+    refusal_ = faultOfHead(tooLarge);
     fillRequest();
     return Step::head;
 }
 
-RequestReader::Refused RequestReader::faultOfHead(bool bodyTooLarge, bool bodyMalformed) const {
+RequestReader::Refused RequestReader::faultOfHead(bool bodyTooLarge) const {
     const auto& message = parser_->http->get();
     const auto hosts = message.count(http::field::host);
     if (hosts > 1 || (hosts == 0 && message.version() == 11)) {
         return {400, "The request must have exactly one Host header."};
     }
+    if (!isHost(message[http::field::host])) {
+        return {400, "The Host header must be a name or an address, with a port at most."};
+    }
     const auto coding = message.find(http::field::transfer_encoding);
     if (coding != message.end() && !boost::beast::iequals(coding->value(), "chunked")) {
         return {501, "The only supported transfer coding is chunked."};
     }
+    if (coding != message.end() && message.version() == 10) {
+        return {400, "HTTP/1.0 has no transfer codings."};
+    }
     if (!message.target().starts_with('/')) {
         return {400, "The request target must begin with \"/\"."};
-    }
-    if (bodyMalformed) {
-        return {400, "The body is not well-formed HTTP."};
     }
     return bodyTooLarge ? tooLargeBody() : Refused{};
 }
@@ -164,7 +178,8 @@ void RequestReader::fillRequest() {
     request_.ifMatch = text(message[http::field::if_match]);
     request_.wellFormed = refusal_.detail.empty();
     keepAlive_ = request_.wellFormed && message.keep_alive();
-    expectsContinue_ = request_.wellFormed && !parser.is_done() &&
+    // A client that has begun the body does not wait.
+    expectsContinue_ = request_.wellFormed && !parser.is_done() && begin_ == end_ &&
                        boost::beast::iequals(message[http::field::expect], "100-continue");
 }
 
@@ -173,7 +188,9 @@ RequestReader::Step RequestReader::readBody() {
         return Step::refused;
     }
     auto& parser = *parser_->http;
-    if (!parser.is_done() && begin_ < end_) {
+    // The parser relies on seeing the last chunk whole, as soon as it has seen its first line.
+    const std::size_t least = parser.chunked() ? shortestLastChunk : 1;
+    if (!parser.is_done() && end_ - begin_ >= least) {
         boost::beast::error_code error;
         begin_ += parser.put(boost::asio::const_buffer(buffer_.data() + begin_, end_ - begin_), error);
         if (error == http::error::body_limit) {

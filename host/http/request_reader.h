@@ -60,9 +60,9 @@ private:
     Step readHead();
     Step readBody();
     Step refuse(int status, const char* detail);
-    Step checkHead();
+    Step checkHead(std::size_t size);
     Refused tooLargeBody() const;
-    Refused faultOfHead(bool bodyTooLarge, bool bodyMalformed) const;
+    Refused faultOfHead(bool bodyTooLarge) const;
     void fillRequest();
 
     const std::size_t headLimit_;

@@ -186,6 +186,9 @@ TEST_F(HostAccess, TheHostMustBeThisOne) {
           std::string("10.0.0.1"), std::string("[::1"), std::string("")}) {
         EXPECT_EQ(askFor(host), 403) << host;
     }
+    for (const char* host : {"[::1]x", "[::1]80", "[::1]]", "[::1]x:80"}) {
+        EXPECT_EQ(askFor(host), 400) << host;
+    }
 }
 
 TEST_F(HostAccess, PagesOfAnotherOriginAreRefused) {

@@ -1,10 +1,15 @@
 // HTTP that is malformed, ambiguous, split or hurried.
 
+#include "host/http/request_reader.h"
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
 
+#include <algorithm>
+
 namespace {
+
+using velt::host::RequestReader;
 
 const std::string target = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
 
@@ -73,6 +78,61 @@ TEST_F(HostFraming, ChunkedBodiesAreUnderstood) {
     EXPECT_EQ(refused(head + "zz\r\n{}\r\n0\r\n\r\n").status, 400);
 }
 
+TEST_F(HostFraming, TrailersAreNotTakenForHeaders) {
+    const std::string head =
+        "POST " + target + "set HTTP/1.1\r\nHost: localhost\r\nTransfer-Encoding: chunked\r\n";
+    const std::string chunks = "\r\nf\r\n{\"enable\":true}\r\n0\r\n";
+    EXPECT_EQ(refused(head + chunks + admin + "\r\n").status, 401);
+    Client client = connect();
+    for (const char* trailer : {"Connection: close\r\n", "If-Match: \"other\"\r\n", "Host: evil.example\r\n",
+                                "Authorization: Bearer wrong\r\n", "Expect: 100-continue\r\n"}) {
+        EXPECT_EQ(client.ask(head + admin + chunks + trailer + "\r\n").status, 204) << trailer;
+    }
+}
+
+/// The reader's answer to the text, which arrives in pieces that begin at these places.
+RequestReader::Step readInPieces(RequestReader& reader, const std::string& text,
+                                 const std::vector<std::size_t>& places) {
+    auto step = RequestReader::Step::needMore;
+    for (std::size_t i = 0; i < places.size(); ++i) {
+        const std::size_t end = i + 1 < places.size() ? places[i + 1] : text.size();
+        const std::string piece = text.substr(places[i], end - places[i]);
+        const auto [space, size] = reader.space();
+        EXPECT_GE(size, piece.size());
+        std::copy(piece.begin(), piece.end(), space);
+        reader.added(piece.size());
+        do {
+            step = reader.next();
+        } while (step == RequestReader::Step::head);
+    }
+    return step;
+}
+
+TEST(RequestReading, ChunksMayArriveInAnyPieces) {
+    for (const std::string trailers : {"", "X-Sum: 1\r\n"}) {
+        for (const std::string chunks : {"", "5\r\n{\"ena\r\n0a;x=y\r\nble\":true}\r\n"}) {
+            const std::string text = "POST / HTTP/1.1\r\nHost: x\r\nTransfer-Encoding: chunked\r\n\r\n" +
+                                     chunks + "0\r\n" + trailers + "\r\n";
+            for (std::size_t first = 1; first < text.size(); ++first) {
+                for (std::size_t second = first + 1; second < text.size(); ++second) {
+                    RequestReader reader(1000, 1000);
+                    ASSERT_EQ(readInPieces(reader, text, {0, first, second}), RequestReader::Step::request)
+                        << first << " " << second;
+                    ASSERT_EQ(reader.request().body, chunks.empty() ? "" : R"({"enable":true})");
+                }
+            }
+            for (std::size_t size = 1; size < text.size(); ++size) {
+                std::vector<std::size_t> places;
+                for (std::size_t place = 0; place < text.size(); place += size) {
+                    places.push_back(place);
+                }
+                RequestReader reader(1000, 1000);
+                ASSERT_EQ(readInPieces(reader, text, places), RequestReader::Step::request) << size;
+            }
+        }
+    }
+}
+
 TEST_F(HostFraming, UnknownTransferCodingsAreNotImplemented) {
     for (const char* coding : {"gzip", "identity", "gzip, chunked", "chunked, gzip", "xchunked"}) {
         const Answer answer = refused("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +
@@ -122,6 +182,8 @@ TEST_F(HostFraming, MalformedHeadsAreRefused) {
          }) {
         EXPECT_EQ(refused(text).status, 400) << text;
     }
+    EXPECT_EQ(refused("POST /api HTTP/1.0\r\nTransfer-Encoding: chunked\r\n" + host + "\r\n0\r\n\r\n").status,
+              400);
     EXPECT_EQ(refused("GET /healthz HTTP/2.0\r\n" + host + "\r\n").status, 505);
 }
 
