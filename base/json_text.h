@@ -6,6 +6,7 @@
 
 #include <json/value.h>
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -14,6 +15,9 @@ namespace velt {
 /// The value of a JSON text: no comments, no duplicate keys, nothing after the value. An error says where the
 /// first mistake is, "line 1, column 5: ...", without a full stop. Thread-safe.
 Result<Json::Value> parseJson(std::string_view text);
+
+/// Where in the text the byte at `offset` is: "line 1, column 5".
+std::string placeIn(std::string_view text, std::size_t offset);
 
 /// The value as text, UTF-8 as it is: on one line, or indented by this text and without a line end.
 /// Thread-safe.

@@ -3,20 +3,11 @@
 #include "base/json_text.h"
 #include "base/utf8.h"
 
-#include <algorithm>
-
 namespace velt::host {
 
 namespace {
 
 constexpr const char* blanks = " \t\r\n";
-
-std::string positionOf(std::string_view text, std::size_t offset) {
-    const std::string_view before = text.substr(0, offset);
-    const auto lines = std::count(before.begin(), before.end(), '\n');
-    const std::size_t lineStart = before.rfind('\n') + 1;
-    return "line " + std::to_string(lines + 1) + ", column " + std::to_string(offset - lineStart + 1);
-}
 
 /// Bytes that are not UTF-8 are inside strings, where any character may take their place.
 std::string repaired(const std::string& text) {
@@ -38,11 +29,11 @@ Result<Json::Value> parseObject(std::string_view text) {
         return Json::Value(Json::objectValue);
     }
     if (const std::size_t invalid = findInvalidUtf8(text); invalid != std::string_view::npos) {
-        return Error(positionOf(text, invalid) + ": the text is not UTF-8");
+        return Error(placeIn(text, invalid) + ": the text is not UTF-8");
     }
     auto value = parseJson(text);
     if (value && !value->isObject()) {
-        return Error(positionOf(text, text.find_first_not_of(blanks)) +
+        return Error(placeIn(text, text.find_first_not_of(blanks)) +
                      ": expected a JSON object, such as {\"key\": true}");
     }
     return value;

@@ -20,6 +20,15 @@ TEST(JsonText, IsReadStrictly) {
     }
 }
 
+TEST(JsonText, HasNoComments) {
+    for (const char* text : {"/*c*/ {}", "{} //c", "{/*c*/}", "{\"a\" /*c*/: 1}", "{\"a\": /*c*/ 1}",
+                             "{\"a\": 1 //c\n}", "[1 /*c*/, 2]", "[1, 2 /*c*/]", "[/*c*/]", "[//c\n1]"}) {
+        EXPECT_NE(faultOf(text), "none") << text;
+    }
+    EXPECT_EQ(faultOf("{\n  \"a\": 1 /*c*/}"), "line 2, column 10: JSON has no comments");
+    EXPECT_EQ(parseJson(R"({"/*a*/": "\"//b"})")->get("/*a*/", {}), Json::Value("\"//b"));
+}
+
 TEST(JsonText, IsRefusedWithThePlace) {
     EXPECT_EQ(faultOf("{\n  \"a\" 1}"), "line 2, column 7: Missing ':' after object member name");
     EXPECT_EQ(faultOf("{\"a\": tru}"), "line 1, column 7: Syntax error: value, object or array expected");
