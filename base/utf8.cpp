@@ -63,4 +63,17 @@ std::size_t findInvalidUtf8(std::string_view text) {
     return std::string_view::npos;
 }
 
+bool holdsSteering(std::string_view text) {
+    while (!text.empty()) {
+        const auto [length, code] = firstUtf8Character(text);
+        const bool control = code < 0x20 || (code >= 0x7F && code < 0xA0);
+        const bool direction = (code >= 0x202A && code <= 0x202E) || (code >= 0x2066 && code <= 0x2069);
+        if (length == 0 || control || direction) {
+            return true;
+        }
+        text.remove_prefix(length);
+    }
+    return false;
+}
+
 } // namespace velt

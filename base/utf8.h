@@ -18,6 +18,9 @@ Utf8Character firstUtf8Character(std::string_view text);
 /// The offset of the first byte that is not UTF-8, or npos.
 std::size_t findInvalidUtf8(std::string_view text);
 
+/// Whether a well-formed text holds control characters, or ones that change the direction of what follows.
+bool holdsSteering(std::string_view text);
+
 } // namespace velt
 
 #endif

@@ -1,11 +1,9 @@
 #include "host/api/tokens.h"
 
 #include "base/json_value.h"
-#include "base/text.h"
+#include "base/utf8.h"
 #include "host/api/problem.h"
 #include "host/base/json.h"
-
-#include <algorithm>
 
 namespace velt::host {
 
@@ -14,10 +12,11 @@ namespace {
 constexpr std::size_t maxName = 64;
 constexpr const char* noneMade = " No token was created.";
 
-/// A name that is safe in logs: not empty, without control characters.
+/// A name that is safe in logs: not empty, without characters that steer a terminal or turn the text around
+/// them.
 bool isName(const Json::Value& value) {
     const std::string name = value.isString() ? value.asString() : "";
-    return !name.empty() && name.size() <= maxName && std::ranges::none_of(name, isControl);
+    return !name.empty() && name.size() <= maxName && !holdsSteering(name);
 }
 
 HttpResponse list(const TokenStore& store) {
@@ -32,8 +31,8 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     }
     const Json::Value& name = (*body)["name"];
     if (!isName(name)) {
-        return fieldProblem(422, {"name", "a text of 1 to 64 bytes without control characters"}, noneMade,
-                            call.id);
+        return fieldProblem(422, {"name", "a text of 1 to 64 bytes without control and direction characters"},
+                            noneMade, call.id);
     }
     const Json::Value& word = (*body)["role"];
     const auto role = word.isString() ? roleNamed(word.asString()) : std::nullopt;
