@@ -40,13 +40,19 @@ struct Error {
 ///
 ///     VELT_ASSIGN_OR_RETURN(const std::string text, readFile(path));
 template<class Value = void> class [[nodiscard]] Result {
+    template<class From>
+    static constexpr bool isMadeOf =
+        std::is_convertible_v<From, Value> && !std::is_same_v<std::remove_cvref_t<From>, Value> &&
+        !std::is_same_v<std::remove_cvref_t<From>, Error>;
+
 public:
     Result(Value value) : outcome_(std::move(value)) {}
     Result(Error error) : outcome_(std::move(error)) {}
     /// From anything that converts to the value, such as std::nullopt or a literal.
     template<class From>
-    requires std::is_convertible_v<From, Value> &&(!std::is_same_v<std::remove_cvref_t<From>, Value>)&&(
-        !std::is_same_v<std::remove_cvref_t<From>, Error>)Result(From&& value)
+    requires(isMadeOf<From>)
+        // NOLINTNEXTLINE(bugprone-forwarding-reference-overload): never a Result, as required
+        Result(From&& value)
         : outcome_(Value(std::forward<From>(value))) {}
 
     explicit operator bool() const { return std::holds_alternative<Value>(outcome_); }
