@@ -41,15 +41,6 @@ Json::Value parseValue(const std::string& word, SettingType type) {
     return word;
 }
 
-SettingGroup groupOf(const schema::SettingGroup& table, int version) {
-    SettingGroup group{table.name, table.api, version, {}};
-    std::ranges::copy_if(
-        table.settings, std::back_inserter(group.settings), [version](const Setting& setting) {
-            return setting.key != nullptr && (setting.apiVersion == 0 || setting.apiVersion == version);
-        });
-    return group;
-}
-
 std::string seeHelp(const SettingGroup& group) {
     return std::string("Run 'veltctl ") + group.command + " set --help' for all settings.";
 }
@@ -80,16 +71,17 @@ std::string SettingGroup::keys() const {
     return list;
 }
 
-SettingGroup ftpSettings(int version) {
-    return groupOf(schema::ftp, version);
+SettingGroup groupOf(const schema::SettingGroup& table, int version) {
+    SettingGroup group{table.name, table.api, version, {}};
+    std::ranges::copy_if(
+        table.settings, std::back_inserter(group.settings), [version](const Setting& setting) {
+            return setting.key != nullptr && (setting.apiVersion == 0 || setting.apiVersion == version);
+        });
+    return group;
 }
 
-SettingGroup securitySettings() {
-    return groupOf(schema::security, schema::security.newestApiVersion);
-}
-
-SettingGroup sftpSettings() {
-    return groupOf(schema::sftp, schema::sftp.newestApiVersion);
+SettingGroup newestGroupOf(const schema::SettingGroup& table) {
+    return groupOf(table, table.newestApiVersion);
 }
 
 bool hasType(const Json::Value& value, SettingType type) {

@@ -27,12 +27,9 @@ struct SettingGroup {
     std::string keys() const; ///< all keys, separated by commas
 };
 
-inline constexpr int newestFtpVersion = 3;
-
-/// `version` is 1, 2 or 3; they differ in the key for UTF-8.
-SettingGroup ftpSettings(int version = newestFtpVersion);
-SettingGroup securitySettings();
-SettingGroup sftpSettings();
+/// The group as a version of its API has it; the versions of FTP's differ in the key for UTF-8.
+SettingGroup groupOf(const schema::SettingGroup& table, int version);
+SettingGroup newestGroupOf(const schema::SettingGroup& table);
 
 /// Whether the value has the JSON type of the setting.
 bool hasType(const Json::Value& value, SettingType type);

@@ -89,7 +89,7 @@ void changeSettings(Context& context, const SettingGroup& group, const std::vect
 }
 
 struct SettingsOptions {
-    int version = newestFtpVersion;
+    int version;
     std::vector<std::string> words;
 };
 
@@ -103,39 +103,42 @@ std::string footerOf(const SettingGroup& group) {
     return text;
 }
 
-void addGroup(CLI::App& app, Command& chosen, const std::string& title,
-              const std::function<SettingGroup(int)>& groupOf) {
-    const SettingGroup group = groupOf(newestFtpVersion);
-    const bool versioned = group.version > 1;
-    auto options = std::make_shared<SettingsOptions>();
-    CLI::App* area = app.add_subcommand(group.command, "Read and change " + title);
+void addVersion(CLI::App* command, int& version, int newest) {
+    const std::string last = std::to_string(newest);
+    command
+        ->add_option("--api-version", version, "Version of the API: 1 to " + last + " (default " + last + ")")
+        ->check(CLI::Range(1, newest))
+        ->type_name("N");
+}
+
+void addGroup(CLI::App& app, Command& chosen, const schema::SettingGroup& table) {
+    const std::string title = table.title;
+    const int newest = table.newestApiVersion;
+    auto options = std::make_shared<SettingsOptions>(SettingsOptions{newest, {}});
+    CLI::App* area = app.add_subcommand(table.name, "Read and change " + title);
     area->require_subcommand(1);
     CLI::App* get = area->add_subcommand("get", "Show " + title);
     CLI::App* set = area->add_subcommand("set", "Change " + title + "; what is not named keeps its value");
     // Newer parsers accept no "=" in the name of an argument.
     set->add_option("setting", options->words, "The settings to change")->required()->type_name("key=value");
-    set->footer(footerOf(group));
-    if (versioned) {
-        for (CLI::App* command : {get, set}) {
-            command
-                ->add_option("--api-version", options->version, "Version of the API: 1, 2 or 3 (default 3)")
-                ->check(CLI::Range(1, newestFtpVersion))
-                ->type_name("N");
-        }
+    set->footer(footerOf(newestGroupOf(table)));
+    if (newest > 1) {
+        addVersion(get, options->version, newest);
+        addVersion(set, options->version, newest);
     }
     onWords(get, chosen,
-            [options, groupOf](Context& context) { showSettings(context, groupOf(options->version)); });
-    onWords(set, chosen, [options, groupOf](Context& context) {
-        changeSettings(context, groupOf(options->version), options->words);
+            [options, &table](Context& context) { showSettings(context, groupOf(table, options->version)); });
+    onWords(set, chosen, [options, &table](Context& context) {
+        changeSettings(context, groupOf(table, options->version), options->words);
     });
 }
 
 } // namespace
 
 void addSettingsCommands(CLI::App& app, Command& chosen) {
-    addGroup(app, chosen, "the FTP and FTPS settings", ftpSettings);
-    addGroup(app, chosen, "the security settings of FTP", [](int) { return securitySettings(); });
-    addGroup(app, chosen, "the SFTP settings", [](int) { return sftpSettings(); });
+    for (const schema::SettingGroup* table : schema::groups) {
+        addGroup(app, chosen, *table);
+    }
 }
 
 } // namespace velt::cli

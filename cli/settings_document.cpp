@@ -7,6 +7,7 @@
 #include "cli/current_settings.h"
 
 #include <algorithm>
+#include <functional>
 
 namespace velt::cli {
 
@@ -16,8 +17,17 @@ constexpr const char* formatName = "velt-settings";
 constexpr int formatVersion = 1;
 constexpr const char* rulesSection = "chroot_rules";
 
+bool switchesAService(const SettingGroup& group) {
+    return std::ranges::any_of(group.settings, [](const Setting& each) { return each.service != nullptr; });
+}
+
 std::vector<SettingGroup> groupsInOrder() {
-    return {securitySettings(), ftpSettings(), sftpSettings()};
+    std::vector<SettingGroup> groups;
+    for (const schema::SettingGroup* table : schema::groups) {
+        groups.push_back(newestGroupOf(*table));
+    }
+    std::ranges::stable_partition(groups, std::not_fn(switchesAService));
+    return groups;
 }
 
 // Whether the port lies in a passive range such as "55536:55899".
@@ -33,7 +43,7 @@ bool sftpMovesFirst(ApiClient& api, const Json::Value& document) {
     if (!document.isMember("ftp") || !document.isMember("sftp")) {
         return false;
     }
-    const int port = readSettings(api, sftpSettings())["portnum"].asInt();
+    const int port = readSettings(api, newestGroupOf(schema::sftp))["portnum"].asInt();
     const Json::Value& ftp = document["ftp"];
     const bool inWay = ftp["portnum"] == port ||
                        (ftp["custom_port_range"] == true && inRange(ftp["custom_port"].asString(), port));
@@ -72,8 +82,10 @@ void checkTop(const Json::Value& document, std::vector<std::string>& faults) {
         faults.push_back(std::string("format: expected \"") + formatName + "\" with format_version " +
                          std::to_string(formatVersion));
     }
-    static const std::vector<std::string> known = {"format",   "format_version", "ftp",
-                                                   "security", rulesSection,     "sftp"};
+    std::vector<std::string> known = {"format", "format_version", rulesSection};
+    for (const schema::SettingGroup* table : schema::groups) {
+        known.emplace_back(table->name);
+    }
     for (const std::string& name : document.getMemberNames()) {
         if (std::ranges::find(known, name) == known.end()) {
             faults.push_back(name + ": unknown section");
@@ -222,7 +234,10 @@ ImportPlan planImport(ApiClient& api, const Json::Value& document) {
     }
     std::vector<SettingGroup> groups = groupsInOrder();
     if (sftpMovesFirst(api, document)) {
-        std::swap(groups[1], groups[2]);
+        const auto place = [&](std::string_view command) {
+            return std::ranges::find(groups, command, &SettingGroup::command);
+        };
+        std::iter_swap(place(schema::ftp.name), place(schema::sftp.name));
     }
     for (const SettingGroup& group : groups) {
         if (document.isMember(group.command)) {

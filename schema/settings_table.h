@@ -169,15 +169,22 @@ inline constexpr Setting sftpSettings[] = {
 
 /// The settings behind one API.
 struct SettingGroup {
-    const char* name; ///< on the command line
+    const char* name;  ///< on the command line
+    const char* title; ///< what the settings are, for people
     const char* api;
     int newestApiVersion;
     std::span<const Setting> settings;
 };
 
-inline constexpr SettingGroup ftp{"ftp", "VELT.Core.FileServ.FTP", 3, ftpSettings};
-inline constexpr SettingGroup security{"security", "VELT.Core.FileServ.FTP.Security", 1, securitySettings};
-inline constexpr SettingGroup sftp{"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, sftpSettings};
+inline constexpr SettingGroup ftp{"ftp", "the FTP and FTPS settings", "VELT.Core.FileServ.FTP", 3,
+                                  ftpSettings};
+inline constexpr SettingGroup security{"security", "the security settings of FTP",
+                                       "VELT.Core.FileServ.FTP.Security", 1, securitySettings};
+inline constexpr SettingGroup sftp{"sftp", "the SFTP settings", "VELT.Core.FileServ.FTP.SFTP", 1,
+                                   sftpSettings};
+
+/// In the order in which people are shown them.
+inline constexpr const SettingGroup* groups[] = {&ftp, &security, &sftp};
 
 } // namespace velt::schema
 

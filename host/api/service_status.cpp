@@ -2,27 +2,30 @@
 
 #include "base/json_value.h"
 #include "host/module/module_call.h"
+#include "schema/settings_table.h"
 
 #include <algorithm>
-#include <array>
 
 namespace velt::host {
 
 namespace {
 
-/// Which row tells about a service.
-struct Place {
-    std::string_view service;
-    const char* api;
-    int version;
-    const char* switchKey;
+/// The setting that switches a service on and off.
+struct Switch {
+    const schema::SettingGroup* group;
+    const char* key;
 };
 
-constexpr std::array<Place, 3> places{{
-    {"ftp", "VELT.Core.FileServ.FTP", 3, "enable_ftp"},
-    {"ftps", "VELT.Core.FileServ.FTP", 3, "enable_ftps"},
-    {"sftp", "VELT.Core.FileServ.FTP.SFTP", 1, "enable"},
-}};
+std::optional<Switch> switchOf(std::string_view service) {
+    for (const schema::SettingGroup* group : schema::groups) {
+        for (const schema::Setting& setting : group->settings) {
+            if (setting.service != nullptr && setting.service == service) {
+                return Switch{group, setting.key};
+            }
+        }
+    }
+    return std::nullopt;
+}
 
 /// The row's answer; null when it fails.
 Json::Value settingsOf(const Row& row, const Principal& principal) {
@@ -42,13 +45,13 @@ public:
     /// Empty when the service's module is not loaded.
     std::optional<Service> read(const StoredService& stored) {
         Service service{stored.name, {}, {}, stored.enabled, false, ""};
-        const auto place = std::ranges::find(places, stored.name, &Place::service);
-        if (place == places.end()) {
+        const auto known = switchOf(stored.name);
+        if (!known) {
             service.enabled = stored.enabled ? Json::Value(*stored.enabled) : Json::Value();
             service.port = stored.port ? Json::Value(*stored.port) : Json::Value();
             return service;
         }
-        const Row* const row = table_.find(place->api, place->version, "get");
+        const Row* const row = table_.find(known->group->api, known->group->newestApiVersion, "get");
         if (row == nullptr) {
             return std::nullopt;
         }
@@ -57,7 +60,7 @@ public:
             former_ = row;
         }
         if (settings_.isObject()) {
-            service.enabled = settings_[place->switchKey];
+            service.enabled = settings_[known->key];
             service.port = settings_["portnum"];
         }
         return service;

@@ -10,8 +10,10 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cctype>
 #include <cstdio>
-#include <map>
+#include <string>
+#include <vector>
 
 namespace velt::host {
 
@@ -54,23 +56,39 @@ void printDemo(const std::string& folder, const std::string& ftpAddress) {
                 root ? "" : (" --user demo:" + password).c_str());
 }
 
+std::string addressOf(const StoredService& service) {
+    return "127.0.0.1:" + (service.port ? std::to_string(*service.port) : "?");
+}
+
+std::string titleOf(std::string name) {
+    std::ranges::transform(name, name.begin(), [](unsigned char c) { return std::toupper(c); });
+    return name;
+}
+
+/// A line for each daemon: "  FTP, FTPS       127.0.0.1:2121, on and off".
+void printServices(const std::vector<StoredService>& services, const std::vector<ServiceDown>& down) {
+    for (auto each = services.begin(); each != services.end();) {
+        const StoredService& first = *each;
+        std::string titles = titleOf(first.name);
+        std::string states = stateOf(first, down);
+        for (++each; each != services.end() && each->daemon == first.daemon; ++each) {
+            titles += ", " + titleOf(each->name);
+            states += std::string(" and ") + stateOf(*each, down);
+        }
+        std::printf("  %-16s%s, %s\n", titles.c_str(), addressOf(first).c_str(), states.c_str());
+    }
+}
+
 } // namespace
 
 void report(const std::string& folder, const std::string& url, const std::string& token) {
     const std::vector<ServiceDown> down = servicesDown();
     printProblems(down);
-    std::map<std::string, const char*> states;
-    std::map<std::string, std::string> addresses;
-    for (const StoredService& each : storedServices()) {
-        states[each.name] = stateOf(each, down);
-        addresses[each.name] = "127.0.0.1:" + (each.port ? std::to_string(*each.port) : "?");
-    }
-    std::printf("  administration  %s, token %s\n"
-                "  FTP, FTPS       %s, %s and %s\n"
-                "  SFTP            %s, %s\n",
-                url.c_str(), token.c_str(), addresses["ftp"].c_str(), states["ftp"], states["ftps"],
-                addresses["sftp"].c_str(), states["sftp"]);
-    printDemo(folder, addresses["ftp"]);
+    const std::vector<StoredService> services = storedServices();
+    std::printf("  administration  %s, token %s\n", url.c_str(), token.c_str());
+    printServices(services, down);
+    const auto ftp = std::ranges::find(services, "ftp", &StoredService::name);
+    printDemo(folder, ftp == services.end() ? "?" : addressOf(*ftp));
 }
 
 } // namespace velt::host

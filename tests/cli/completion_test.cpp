@@ -87,20 +87,21 @@ TEST(CompletionTest, EveryCommandOffersItsOptions) {
 }
 
 TEST(CompletionTest, EverySettingIsOffered) {
-    Words ftp = with(keysOf(velt::cli::ftpSettings(3)), {"enable_utf8=", "use_utf8="});
+    Words ftp = with(keysOf(velt::cli::newestGroupOf(velt::schema::ftp)), {"enable_utf8=", "use_utf8="});
     std::sort(ftp.begin(), ftp.end());
     EXPECT_EQ(offered({"ftp", "set", ""}), ftp);
-    Words security = keysOf(velt::cli::securitySettings());
+    Words security = keysOf(velt::cli::newestGroupOf(velt::schema::security));
     std::sort(security.begin(), security.end());
     EXPECT_EQ(offered({"security", "set", ""}), security);
-    EXPECT_EQ(offered({"sftp", "set", ""}), keysOf(velt::cli::sftpSettings()));
+    EXPECT_EQ(offered({"sftp", "set", ""}), keysOf(velt::cli::newestGroupOf(velt::schema::sftp)));
     EXPECT_EQ(offered({"--json", "--url", "x", "ftp", "set", "portnum", "=", "5", "enable_f"}),
               (Words{"enable_fips=", "enable_flow_ctrl=", "enable_ftp=", "enable_ftps=", "enable_fxp="}));
 }
 
 TEST(CompletionTest, SwitchesOfferTheirValues) {
     for (const velt::cli::SettingGroup& group :
-         {velt::cli::ftpSettings(3), velt::cli::securitySettings(), velt::cli::sftpSettings()}) {
+         {velt::cli::newestGroupOf(velt::schema::ftp), velt::cli::newestGroupOf(velt::schema::security),
+          velt::cli::newestGroupOf(velt::schema::sftp)}) {
         for (const velt::cli::Setting& setting : group.settings) {
             const Words replies = offered({group.command, "set", setting.key, "="});
             const bool isSwitch = setting.type == velt::cli::SettingType::boolean;
