@@ -8,6 +8,7 @@
 #include "host/base/random_text.h"
 
 #include <algorithm>
+#include <cstdint>
 #include <exception>
 #include <utility>
 
@@ -16,6 +17,10 @@ namespace velt::host {
 namespace {
 
 using Path = std::vector<std::string>;
+
+/// Bytes that hold the parameters of any method without lists. Small, since the values of a body take up to a
+/// hundred times its size.
+constexpr std::size_t usualBody = std::size_t{64} * 1024;
 
 bool matches(const Path& path, const Path& pattern) {
     return std::ranges::equal(path, pattern, [](const std::string& segment, const std::string& wanted) {
@@ -52,7 +57,7 @@ HttpResponse tooBusy(const Call& call) {
 App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
     : log_(log), tokens_(settings.tokenFile), access_(settings.access, tokens_, log),
       platformEvents_(events_), rows_(table, openApi_, metrics_, events_, log),
-      order_(settings.workers, settings.maxWaiting) {
+      order_(settings.workers, settings.maxWaiting, settings.maxWaitingBytes) {
     addRoutes(table);
 }
 
@@ -74,11 +79,20 @@ std::optional<Refusal> App::checkAccess(const HttpRequest& head, const Peer& pee
     return refusal;
 }
 
-bool App::asksForEvents(const HttpRequest& request) const {
+template<class Condition> bool App::asksFor(const HttpRequest& request, const Condition& holds) const {
     const auto path = pathSegments(request.path());
     return path && std::ranges::any_of(routes_, [&](const Route& each) {
-               return !each.answer && each.method == request.method && matches(*path, each.path);
+               return holds(each) && each.method == request.method && matches(*path, each.path);
            });
+}
+
+std::size_t App::bodyLimit(const HttpRequest& head, const Principal& principal) const {
+    const auto takesLists = [](const Route& each) { return each.takesLists; };
+    return principal.role == Role::admin && asksFor(head, takesLists) ? SIZE_MAX : usualBody;
+}
+
+bool App::asksForEvents(const HttpRequest& request) const {
+    return asksFor(request, [](const Route& each) { return !each.answer; });
 }
 
 void App::addEventReader(const std::shared_ptr<EventReader>& reader) {
@@ -130,7 +144,8 @@ void App::submit(const JobPointer& job, const Route& route) {
         return;
     }
     const bool accepted = order_.submit(
-        route.kind, [this, job, &route] { finish(job->done, job->call, answer(route, job->call)); });
+        route.kind, [this, job, &route] { finish(job->done, job->call, answer(route, job->call)); },
+        job->call.request.body.size());
     if (!accepted) {
         finish(job->done, job->call, tooBusy(job->call));
     }

@@ -24,8 +24,9 @@ namespace velt::host {
 struct AppSettings {
     AccessSettings access;
     std::filesystem::path tokenFile;
-    unsigned workers = 4;          ///< threads on which modules run
-    std::size_t maxWaiting = 1000; ///< requests that wait for their turn
+    unsigned workers = 4;                                        ///< threads on which modules run
+    std::size_t maxWaiting = 1000;                               ///< requests that wait for their turn
+    std::size_t maxWaitingBytes = std::size_t{16} * 1024 * 1024; ///< of their bodies
 };
 
 class App final : public HttpHandler {
@@ -35,6 +36,7 @@ public:
 
     std::optional<Refusal> checkAccess(const HttpRequest& head, const Peer& peer,
                                        Principal& principal) override;
+    std::size_t bodyLimit(const HttpRequest& head, const Principal& principal) const override;
     bool asksForEvents(const HttpRequest& request) const override;
     void handle(HttpRequest request, const Principal& principal, Done done) override;
     HttpResponse failure(int status, const std::string& detail) override;
@@ -50,6 +52,9 @@ private:
         Done done;
     };
     using JobPointer = std::shared_ptr<Job>;
+
+    /// Whether the request asks for a route of which `holds` is true.
+    template<class Condition> bool asksFor(const HttpRequest& request, const Condition& holds) const;
 
     void addRoutes(const ModuleTable& table);
     void route(const JobPointer& job);

@@ -128,6 +128,13 @@ std::vector<FieldError> OpenApi::explain(const Row& row, const Json::Value& para
     return errors;
 }
 
+bool OpenApi::takesLists(const Row& row) const {
+    const auto found = schemas_->byPath.find(pathOf(row));
+    return found != schemas_->byPath.end() &&
+           std::ranges::any_of(found->second->source["properties"],
+                               [](const Json::Value& each) { return each["type"] == "array"; });
+}
+
 Route openApiRoute(const OpenApi& openApi) {
     return {"GET", {"openapi.json"}, false, RequestOrder::Kind::unordered, [&openApi](const Call&) {
                 return HttpResponse{200, "application/json", openApi.text(), {}};

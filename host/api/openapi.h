@@ -30,6 +30,9 @@ public:
     /// the module decides whether a request is accepted.
     std::vector<FieldError> explain(const Row& row, const Json::Value& parameters) const;
 
+    /// Whether a parameter of the row is a list.
+    bool takesLists(const Row& row) const;
+
 private:
     struct Schemas;
 

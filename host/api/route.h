@@ -26,6 +26,7 @@ struct Route {
     bool adminOnly;
     RequestOrder::Kind kind;
     std::function<HttpResponse(const Call&)> answer; ///< empty: the server makes it a stream of events
+    bool takesLists = false; ///< so that an admin's body may be as large as the server allows
 };
 
 } // namespace velt::host

@@ -34,7 +34,8 @@ std::vector<Route> Rows::routes() {
                     {"api", row->api, "v" + std::to_string(row->version), row->method},
                     !row->reads(),
                     row->reads() ? Kind::read : Kind::write,
-                    [this, row](const Call& request) { return call(*row, request); }};
+                    [this, row](const Call& request) { return call(*row, request); },
+                    !row->reads() && openApi_.takesLists(*row)};
         if (row->callableByGet()) {
             routes.push_back(route);
             routes.back().method = "GET";

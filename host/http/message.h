@@ -4,6 +4,7 @@
 
 #include <sys/types.h>
 
+#include <cstddef>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -95,6 +96,10 @@ public:
     /// Checks a request's head. Grants access by filling `principal`, or refuses the request.
     virtual std::optional<Refusal> checkAccess(const HttpRequest& head, const Peer& peer,
                                                Principal& principal) = 0;
+
+    /// How large the body of a request may be that was granted access, in bytes, if the server's own limit
+    /// is not smaller.
+    virtual std::size_t bodyLimit(const HttpRequest& head, const Principal& principal) const = 0;
 
     /// Whether the request asks for the stream of events.
     virtual bool asksForEvents(const HttpRequest& request) const = 0;

@@ -35,7 +35,8 @@ struct RequestReader::Parser {
 };
 
 RequestReader::RequestReader(std::size_t headLimit, std::size_t bodyLimit)
-    : headLimit_(headLimit), bodyLimit_(bodyLimit), parser_(std::make_unique<Parser>()) {
+    : headLimit_(headLimit), bodyLimit_(bodyLimit), allowedBody_(bodyLimit),
+      parser_(std::make_unique<Parser>()) {
     reset();
 }
 
@@ -47,6 +48,7 @@ void RequestReader::reset() {
     parser.body_limit(bodyLimit_);
     // Not the limit itself, which the reader enforces: it hands over whole heads.
     parser.header_limit(static_cast<std::uint32_t>(headLimit_ + firstBufferSize));
+    allowedBody_ = bodyLimit_;
     headDone_ = false;
     keepAlive_ = false;
     expectsContinue_ = false;
@@ -77,12 +79,25 @@ bool RequestReader::hasBegun() const {
 }
 
 RequestReader::Refused RequestReader::tooLargeBody() const {
-    return {413, "The body is larger than " + std::to_string(bodyLimit_) + " bytes."};
+    return {413, "The body is larger than " + std::to_string(allowedBody_) + " bytes."};
 }
 
 RequestReader::Step RequestReader::refuse(int status, const char* detail) {
     refusal_ = {status, detail};
     return Step::refused;
+}
+
+void RequestReader::limitBody(std::size_t limit) {
+    if (limit >= allowedBody_ || !refusal_.detail.empty()) {
+        return;
+    }
+    allowedBody_ = limit;
+    parser_->http->body_limit(limit);
+    if (parser_->http->content_length_remaining().value_or(0) > limit) {
+        refusal_ = tooLargeBody();
+        keepAlive_ = false;
+        expectsContinue_ = false;
+    }
 }
 
 RequestReader::Step RequestReader::next() {

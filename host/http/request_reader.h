@@ -33,6 +33,9 @@ public:
     RequestReader(const RequestReader&) = delete;
     RequestReader& operator=(const RequestReader&) = delete;
 
+    /// Call it after Step::head: this request's body may be no larger.
+    void limitBody(std::size_t limit);
+
     /// Where the next bytes go, and how many fit; at least one after needMore.
     std::pair<char*, std::size_t> space();
     void added(std::size_t bytes);
@@ -67,6 +70,7 @@ private:
 
     const std::size_t headLimit_;
     const std::size_t bodyLimit_;
+    std::size_t allowedBody_; ///< of this request
     std::unique_ptr<Parser> parser_;
     std::string buffer_;
     std::size_t begin_ = 0;

@@ -147,6 +147,7 @@ private:
             return false;
         }
         trust();
+        reader_.limitBody(handler_.bodyLimit(reader_.request(), principal_));
         if (!reader_.expectsContinue()) {
             return true;
         }

@@ -10,7 +10,8 @@ constexpr unsigned unorderedThreads = 2;
 
 } // namespace
 
-RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting) : maxWaiting_(maxWaiting) {
+RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting, std::size_t maxWaitingBytes)
+    : maxWaiting_(maxWaiting), maxWaitingBytes_(maxWaitingBytes) {
     threads_.reserve(threads + unorderedThreads);
     for (unsigned i = 0; i < threads; ++i) {
         threads_.emplace_back([this] { work(ordered_); });
@@ -24,14 +25,15 @@ RequestOrder::~RequestOrder() {
     stop();
 }
 
-bool RequestOrder::submit(Kind kind, Task task) {
+bool RequestOrder::submit(Kind kind, Task task, std::size_t bytes) {
     Pool& pool = kind == Kind::unordered ? unordered_ : ordered_;
     {
         const std::lock_guard lock(mutex_);
-        if (stopping_ || pool.queue.size() >= maxWaiting_) {
+        if (stopping_ || pool.queue.size() >= maxWaiting_ || pool.bytes + bytes > maxWaitingBytes_) {
             return false;
         }
-        pool.queue.push_back({kind, std::move(task)});
+        pool.queue.push_back({kind, std::move(task), bytes});
+        pool.bytes += bytes;
     }
     pool.changed.notify_one();
     return true;
@@ -75,6 +77,7 @@ void RequestOrder::work(Pool& pool) {
         }
         Waiting next = std::move(pool.queue.front());
         pool.queue.pop_front();
+        pool.bytes -= next.bytes;
         note(next.kind, true);
         lock.unlock();
         // The next one may be a read that can run at the same time.

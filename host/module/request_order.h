@@ -27,16 +27,17 @@ public:
     using Task = std::function<void()>;
 
     /// `threads` are for reads and writes. Of each kind, ordered and unordered, at most `maxWaiting` may
-    /// wait.
-    RequestOrder(unsigned threads, std::size_t maxWaiting);
+    /// wait, and hold at most `maxWaitingBytes`.
+    RequestOrder(unsigned threads, std::size_t maxWaiting, std::size_t maxWaitingBytes);
 
     /// Calls stop().
     ~RequestOrder();
     RequestOrder(const RequestOrder&) = delete;
     RequestOrder& operator=(const RequestOrder&) = delete;
 
-    /// False when too many are waiting or stop() was called; the task is then dropped.
-    bool submit(Kind kind, Task task);
+    /// The task holds so many bytes while it waits. False when too many are waiting or stop() was called; the
+    /// task is then dropped.
+    bool submit(Kind kind, Task task, std::size_t bytes = 0);
 
     /// Finishes what was submitted, then ends the threads. May be called again.
     void stop();
@@ -45,10 +46,12 @@ private:
     struct Waiting {
         Kind kind;
         Task task;
+        std::size_t bytes;
     };
 
     struct Pool {
         std::deque<Waiting> queue;
+        std::size_t bytes = 0; ///< that the waiting ones hold
         std::condition_variable changed;
     };
 
@@ -57,6 +60,7 @@ private:
     void note(Kind kind, bool runs);
 
     const std::size_t maxWaiting_;
+    const std::size_t maxWaitingBytes_;
     std::mutex mutex_;
     Pool ordered_;
     Pool unordered_;

@@ -52,11 +52,40 @@ TEST_F(HostLimits, AHugeHeadIsRefusedAlthoughItGoesOn) {
 
 TEST_F(HostLimits, ABodyMayBeAsLargeAsTheLimit) {
     start();
-    const std::string json = R"({"enable":true})";
-    EXPECT_EQ(post(target + "set", json + std::string(limits.body - json.size(), ' ')).status, 204);
-    const Answer large = post(target + "set", json + std::string(limits.body - json.size() + 1, ' '));
+    const std::string rules = "/api/VELT.Core.FileServ.FTP.ChrootUser/v2/save";
+    const std::string json = R"({"rules":[]})";
+    EXPECT_EQ(post(rules, json + std::string(limits.body - json.size(), ' ')).status, 204);
+    const Answer large = post(rules, json + std::string(limits.body - json.size() + 1, ' '));
     EXPECT_EQ(large.status, 413);
     EXPECT_EQ(large.header("content-type"), "application/problem+json");
+}
+
+TEST_F(HostLimits, OnlyTheListsOfAdminsAreLarge) {
+    start();
+    constexpr std::size_t most = 64 * 1024;
+    const std::string json = R"({"enable":true})";
+    const std::string usual = json + std::string(most - json.size(), ' ');
+    EXPECT_EQ(post(target + "set", usual).status, 204);
+    const Answer large = post(target + "set", usual + " ");
+    EXPECT_EQ(large.status, 413);
+    EXPECT_EQ(large.json()["detail"], "The body is larger than 65536 bytes.");
+    EXPECT_EQ(post("/api/tokens", usual + " ").status, 413);
+    EXPECT_EQ(post(target + "get", usual + " ").status, 413);
+    EXPECT_EQ(ask("POST", target + "get", viewer, usual).status, 200);
+    const std::string chroot = "/api/VELT.Core.FileServ.FTP.ChrootUser/";
+    for (const char* method : {"v1/add", "v1/delete", "v2/save"}) {
+        EXPECT_NE(post(chroot + method, usual + " ").status, 413) << method;
+        EXPECT_EQ(ask("POST", chroot + method, viewer, usual + " ").status, 413) << method;
+    }
+    Client chunked = connect();
+    const std::string head = "POST " + target + "get HTTP/1.1\r\nHost: localhost\r\n" + viewer;
+    chunked.send(head + "Transfer-Encoding: chunked\r\n\r\n10000\r\n" + usual + "\r\n1\r\n \r\n0\r\n\r\n");
+    EXPECT_EQ(chunked.receive().status, 413);
+    Client patient = connect();
+    const std::string wish = "Expect: 100-continue\r\nContent-Length: ";
+    EXPECT_EQ(patient.ask(head + wish + "65537\r\n\r\n").status, 413) << "before the body is sent";
+    Client next = connect();
+    EXPECT_EQ(next.ask(head + wish + "65536\r\n\r\n").status, 100);
 }
 
 TEST_F(HostLimits, AHugeChunkedBodyIsRefused) {

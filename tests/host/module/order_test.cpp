@@ -123,8 +123,36 @@ TEST_F(HostOrder, TooManyWaitingRequestsAreTurnedAway) {
     EXPECT_EQ(refused, 2);
 }
 
+TEST(RequestOrder, WhatWaitsHoldsALimitedNumberOfBytes) {
+    RequestOrder order(1, 100, 1000);
+    std::promise<void> started;
+    std::promise<void> release;
+    ASSERT_TRUE(order.submit(
+        Kind::write,
+        [&] {
+            started.set_value();
+            release.get_future().wait();
+        },
+        1000));
+    started.get_future().wait();
+    EXPECT_TRUE(order.submit(
+        Kind::read, [] {}, 600))
+        << "the one that runs does not wait";
+    EXPECT_FALSE(order.submit(
+        Kind::read, [] {}, 401));
+    EXPECT_TRUE(order.submit(
+        Kind::read, [] {}, 400));
+    EXPECT_TRUE(order.submit(Kind::read, [] {}));
+    std::promise<void> last;
+    EXPECT_TRUE(order.submit(Kind::write, [&] { last.set_value(); }));
+    release.set_value();
+    last.get_future().wait();
+    EXPECT_TRUE(order.submit(
+        Kind::read, [] {}, 1000));
+}
+
 TEST(RequestOrder, AReadThatComesAfterAWaitingWriteWaitsForIt) {
-    RequestOrder order(4, 100);
+    RequestOrder order(4, 100, 0);
     std::promise<void> release;
     std::mutex mutex;
     std::string sequence;
@@ -150,7 +178,7 @@ TEST(RequestOrder, AReadThatComesAfterAWaitingWriteWaitsForIt) {
 }
 
 TEST(RequestOrder, AStopFinishesWhatWaitsAndTakesNoMore) {
-    RequestOrder order(2, 100);
+    RequestOrder order(2, 100, 0);
     std::atomic<int> done{0};
     for (int i = 0; i < 20; ++i) {
         EXPECT_TRUE(order.submit(i % 2 == 0 ? Kind::write : Kind::read, [&] {
