@@ -15,6 +15,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <csignal>
 #include <cstdio>
 #include <exception>
@@ -77,6 +78,8 @@ HttpLimits possibleLimits(const Config& config, HostLog& log) {
         log.write("the limit of open files allows only " + std::to_string(limits.connections) +
                   " connections");
     }
+    // One that has all of its share leaves most of them to others.
+    limits.connectionsOfOne = std::max<std::size_t>(1, limits.connections / 4);
     return limits;
 }
 

@@ -76,6 +76,7 @@ std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, cons
         }
         principal.role = Role::admin;
         principal.actor = userName(peer.uid);
+        principal.holder = isOwn(peer) ? "" : "user " + std::to_string(peer.uid);
         return std::nullopt;
     }
     constexpr std::size_t schemeLength = 7;
@@ -86,11 +87,12 @@ std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, cons
     }
     principal.role = token->role;
     principal.actor = token->name;
+    principal.holder = "token " + token->id;
     return std::nullopt;
 }
 
 bool AccessControl::isAdmin(const Peer& peer) const {
-    if (peer.uid == 0 || peer.uid == geteuid()) {
+    if (isOwn(peer)) {
         return true;
     }
     const auto admins = groupNamed(settings_.adminGroup);

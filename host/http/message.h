@@ -3,6 +3,7 @@
 #define VELT_HOST_HTTP_MESSAGE_H
 
 #include <sys/types.h>
+#include <unistd.h>
 
 #include <cstddef>
 #include <functional>
@@ -24,6 +25,11 @@ struct Peer {
     uid_t uid = static_cast<uid_t>(-1); ///< of a Unix socket's peer
     std::vector<gid_t> groups;          ///< of a Unix socket's peer
 };
+
+/// Whether it is root or the host's own user, on the Unix socket.
+inline bool isOwn(const Peer& peer) {
+    return peer.isUnixSocket && (peer.uid == 0 || peer.uid == geteuid());
+}
 
 /// A request. While only its head has been read, the body is empty.
 struct HttpRequest {
@@ -62,6 +68,7 @@ struct Principal {
     Role role = Role::viewer;
     std::string actor;
     std::string address;
+    std::string holder; ///< whose connections are counted together; "" when they are not limited
 };
 
 /// The answer to a request that is refused by its head.

@@ -31,7 +31,7 @@ std::string commonHead(int status) {
 } // namespace
 
 const char* reasonPhrase(int status) {
-    static constexpr std::array<std::pair<int, const char*>, 18> phrases{{
+    static constexpr std::array<std::pair<int, const char*>, 19> phrases{{
         {200, "OK"},
         {201, "Created"},
         {204, "No Content"},
@@ -45,6 +45,7 @@ const char* reasonPhrase(int status) {
         {412, "Precondition Failed"},
         {413, "Content Too Large"},
         {422, "Unprocessable Content"},
+        {429, "Too Many Requests"},
         {431, "Request Header Fields Too Large"},
         {500, "Internal Server Error"},
         {501, "Not Implemented"},

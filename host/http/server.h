@@ -17,6 +17,8 @@ struct HttpLimits {
     std::size_t head = std::size_t{16} * 1024; ///< bytes
     std::size_t body = std::size_t{1024} * 1024;
     std::size_t connections = 1000;
+    std::size_t connectionsOfOne = 250; ///< with the same token or user
+    std::size_t eventStreamsOfOne = 32;
     std::size_t delayedRefusals = 100; ///< waiting at one time; further failed attempts are answered at once
     std::size_t queuedEvents = std::size_t{256} * 1024; ///< bytes that a slow reader of events may lag behind
     std::chrono::milliseconds headTime{10'000};

@@ -4,6 +4,7 @@
 
 #include "host/http/connections.h"
 #include "host/http/message.h"
+#include "host/http/places.h"
 #include "host/http/request_reader.h"
 #include "host/http/response_text.h"
 #include "host/http/server.h"
@@ -40,7 +41,9 @@ template<class Stream> class EventStream;
 struct SessionShared {
     HttpHandler& handler;
     const HttpLimits limits;
-    boost::asio::io_context context{};
+    Places connectionPlaces{limits.connectionsOfOne};
+    Places eventStreamPlaces{limits.eventStreamsOfOne};
+    boost::asio::io_context context{}; // after the places, which sessions that it still holds give back
     std::atomic<std::size_t> delayedRefusals{0};
 };
 
@@ -146,6 +149,10 @@ private:
             refuseAccess(std::move(*refusal));
             return false;
         }
+        if (!takePlace()) {
+            respond(handler_.failure(429, "Too many connections are open with this token or user."), false);
+            return false;
+        }
         trust();
         reader_.limitBody(handler_.bodyLimit(reader_.request(), principal_));
         if (!reader_.expectsContinue()) {
@@ -159,6 +166,15 @@ private:
                                      }
                                  });
         return false;
+    }
+
+    /// Requests of one connection may show different tokens.
+    bool takePlace() {
+        if (place_ == nullptr || place_->holder() != principal_.holder) {
+            place_.reset();
+            place_ = shared_.connectionPlaces.take(principal_.holder);
+        }
+        return place_ != nullptr;
     }
 
     void refuseAccess(Refusal refusal) {
@@ -181,7 +197,7 @@ private:
         enterWithoutDeadline(State::working);
         HttpRequest request = reader_.takeRequest();
         if (handler_.asksForEvents(request)) {
-            EventStream<Stream>::start(this->shared_from_this());
+            serveEvents();
             return;
         }
         withBody_ = request.method != "HEAD";
@@ -192,6 +208,16 @@ private:
                                 self->respond(answer, self->reader_.keepAlive());
                             });
                         });
+    }
+
+    void serveEvents() {
+        eventStreamPlace_ = shared_.eventStreamPlaces.take(principal_.holder);
+        if (eventStreamPlace_ == nullptr) {
+            respond(handler_.failure(429, "Too many streams of events are open with this token or user."),
+                    reader_.keepAlive());
+            return;
+        }
+        EventStream<Stream>::start(this->shared_from_this());
     }
 
     void respond(const HttpResponse& response, bool keepAlive) {
@@ -247,6 +273,8 @@ private:
     const HttpLimits& limits_;
     RequestReader reader_;
     Principal principal_;
+    std::unique_ptr<Places::Place> place_;
+    std::unique_ptr<Places::Place> eventStreamPlace_;
     std::string output_;
     bool withBody_ = true;
     std::array<char, 1024> discarded_{};

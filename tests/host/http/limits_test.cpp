@@ -183,6 +183,71 @@ TEST_F(HostLimits, ConnectionsBeyondTheLimitAreToldSo) {
     EXPECT_EQ(answer.status, 200);
 }
 
+TEST_F(HostLimits, OneTokenLocksOutNobody) {
+    ASSERT_EQ(velt::host::makeRoomForConnections(3000), 3000U) << "the test needs more descriptors";
+    start();
+    std::deque<Client> open;
+    for (int i = 0; i < 1000; ++i) {
+        open.push_back(connect());
+        open.back().send(requestText("GET", "/events", viewer));
+    }
+    for (int i = 0; i < 1064; ++i) {
+        open.push_back(connect());
+        open.back().send("POST " + target + "get HTTP/1.1\r\nHost: localhost\r\n" + viewer +
+                         "Content-Length: 100\r\n\r\n{");
+    }
+    const auto begin = std::chrono::steady_clock::now();
+    Client root = Client::unixSocket(socketPath);
+    EXPECT_EQ(root.ask(requestText("GET", target + "get")).status, 200);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(100));
+    EXPECT_EQ(get("/healthz").status, 200) << "another token";
+}
+
+TEST_F(HostLimits, AClientHasAShareOfTheConnections) {
+    limits.connectionsOfOne = 3;
+    limits.eventStreamsOfOne = 2;
+    start();
+    std::deque<Client> open;
+    for (int i = 0; i < 2; ++i) {
+        open.push_back(connect());
+        open.back().send(requestText("GET", "/events", viewer));
+        EXPECT_NE(open.back().readUntil(": connected\n\n"), "");
+    }
+    open.push_back(connect());
+    EXPECT_EQ(open.back().ask(requestText("GET", "/events", viewer)).status, 429);
+    EXPECT_EQ(open.back().ask(requestText("GET", "/healthz", viewer)).status, 200) << "not a stream";
+    EXPECT_EQ(ask("GET", "/healthz", viewer).status, 429) << "the fourth connection";
+    EXPECT_EQ(open.back().ask(requestText("GET", "/healthz", admin)).status, 200) << "another token";
+    EXPECT_EQ(ask("GET", "/healthz", viewer).status, 200) << "its place is free";
+    open.clear();
+    const auto streamsAgain = [this] {
+        Client client = connect();
+        client.send(requestText("GET", "/events", viewer));
+        return client.receive(false).status == 200;
+    };
+    bool again = false;
+    for (int i = 0; i < 200 && !again; ++i) {
+        std::this_thread::sleep_for(milliseconds(10));
+        again = streamsAgain();
+    }
+    EXPECT_TRUE(again);
+}
+
+TEST_F(HostLimits, RootIsServedAlthoughAllConnectionsAreInUse) {
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root is let in without the group";
+    }
+    limits.connections = 5;
+    start();
+    std::deque<Client> open;
+    for (int i = 0; i < 100; ++i) {
+        open.push_back(connect());
+        open.back().send(requestText("GET", "/events", admin));
+    }
+    Client root = Client::unixSocket(socketPath);
+    EXPECT_EQ(root.ask(requestText("GET", "/healthz")).status, 200);
+}
+
 TEST_F(HostLimits, WhoOnlyConnectsGivesWay) {
     limits.connections = 5;
     start();
