@@ -111,7 +111,8 @@ bool AccessControl::knowsHost(const std::string& host, const Peer& peer) const {
 
 Refusal AccessControl::refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const {
     const std::string id = nextRequestId();
-    log_.write(id, "access refused (" + std::to_string(status) + ") to " + peer.address + ": " + detail);
+    log_.writeRefusal(id,
+                      "access refused (" + std::to_string(status) + ") to " + peer.address + ": " + detail);
     Refusal refusal{problem(status, detail, id), delayed};
     if (status == 401) {
         refusal.response.headers.emplace_back("WWW-Authenticate", "Bearer");

@@ -102,7 +102,7 @@ void App::addEventReader(const std::shared_ptr<EventReader>& reader) {
 HttpResponse App::failure(int status, const std::string& detail) {
     const std::string id = nextRequestId();
     metrics_.countRefusal(status);
-    log_.write(id, std::to_string(status) + " " + detail);
+    log_.writeRefusal(id, std::to_string(status) + " " + detail);
     return problem(status, detail, id);
 }
 

@@ -2,8 +2,11 @@
 #ifndef VELT_HOST_BASE_HOST_LOG_H
 #define VELT_HOST_BASE_HOST_LOG_H
 
+#include <chrono>
+#include <cstddef>
 #include <functional>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -24,9 +27,19 @@ public:
     /// The same, under a request's id.
     void write(std::string_view requestId, std::string_view text);
 
+    /// The same for a refusal, which anybody can cause as often as he likes: at most ten lines in a second,
+    /// and the next line tells how many were left out.
+    void writeRefusal(std::string_view requestId, std::string_view text);
+
 private:
+    /// How many refusals were left out before this one; nothing when it is to be left out, too.
+    std::optional<std::size_t> admitRefusal();
+
     std::mutex mutex_;
     Sink sink_;
+    std::chrono::steady_clock::time_point second_; ///< the beginning of the current one
+    unsigned refusals_ = 0;                        ///< written in it
+    std::size_t leftOut_ = 0;                      ///< refusals since the last that was written
 };
 
 } // namespace velt::host

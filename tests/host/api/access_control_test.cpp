@@ -139,6 +139,35 @@ TEST_F(HostAccess, WrongTokensAreRefusedAndLogged) {
     EXPECT_TRUE(logged("access refused (401) to 127.0.0.1: The token is not valid."));
 }
 
+TEST_F(HostAccess, ManyRefusalsAreCountedAndNotWritten) {
+    start();
+    const auto refusals = [this](std::size_t count) {
+        const std::string text = requestText("GET", "/healthz");
+        for (std::size_t i = 0; i < count; ++i) {
+            Client client = connect();
+            EXPECT_EQ(client.ask(i % 2 == 0 ? text : "NONSENSE\r\n\r\n").status, i % 2 == 0 ? 401 : 400);
+        }
+    };
+    const auto begin = std::chrono::steady_clock::now();
+    refusals(300);
+    const auto seconds =
+        std::chrono::duration_cast<std::chrono::seconds>(std::chrono::steady_clock::now() - begin);
+    std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+    refusals(1);
+    std::size_t written = 0;
+    std::size_t leftOut = 0;
+    for (const std::string& line : logLines()) {
+        written += line.find("access refused (401)") != std::string::npos ||
+                   line.find("400 The request is not well-formed") != std::string::npos;
+        leftOut += line.find(" refusals before the next line are not logged") != std::string::npos
+                       ? std::stoul(line)
+                       : 0;
+    }
+    EXPECT_EQ(written + leftOut, 301U);
+    EXPECT_LE(written, 10U * (static_cast<std::size_t>(seconds.count()) + 2) + 1);
+    EXPECT_GE(leftOut, 1U);
+}
+
 TEST_F(HostAccess, AWrongTokenWaitsForItsAnswer) {
     limits.refusalDelay = std::chrono::milliseconds(300);
     start();
