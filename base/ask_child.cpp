@@ -30,7 +30,7 @@ Result<int> askChild(const std::function<int()>& question) {
     while (::waitpid(child, nullptr, 0) < 0 && errno == EINTR) {
     }
     if (got != sizeof answer) {
-        return Error("The process that was asked ended without an answer.");
+        return Error("The child process ended without an answer.");
     }
     return answer;
 }

@@ -66,7 +66,7 @@ void runCommand(const Command& command, const GlobalOptions& options, Console& c
     console.out.flush();
     if (!console.out) {
         throw Failure(ExitCode::local, "Cannot write the output.",
-                      "Check where it goes, and that there is space left.");
+                      "Check that the output is writable and has free space.");
     }
 }
 

@@ -21,7 +21,7 @@ ChrootRule ruleFromJson(const Json::Value& object) {
 std::optional<std::string> faultIn(const Json::Value& object) {
     if (!object.isObject() || !object["type"].isString() || !object["name"].isString() ||
         !object["path"].isString()) {
-        return "expected an object with the texts type, name and path";
+        return "expected an object with the strings type, name and path";
     }
     return faultOf(ruleFromJson(object));
 }
@@ -59,7 +59,7 @@ Json::Value rulesToJson(const ChrootRules& rules) {
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults) {
     ChrootRules rules;
     if (!array.isArray()) {
-        faults.emplace_back("rules: expected an array");
+        faults.emplace_back("rules: expected a list");
         return rules;
     }
     for (Json::ArrayIndex i = 0; i < array.size(); ++i) {

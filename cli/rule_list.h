@@ -28,7 +28,7 @@ Json::Value rulesToJson(const ChrootRules& rules);
 /// What is wrong with a rule, in words.
 std::optional<std::string> faultOf(const ChrootRule& rule);
 
-/// The rules of an array of objects; keys other than "type", "name" and "path" are ignored. Each fault of the
+/// The rules of a list of objects; keys other than "type", "name" and "path" are ignored. Each fault of the
 /// array is added to `faults`, in words.
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults);
 

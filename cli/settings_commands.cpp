@@ -54,7 +54,7 @@ Json::Value readBack(Context& context, const SettingGroup& group) {
     try {
         return readSettings(context.api, group);
     } catch (Failure& failure) {
-        failure.note("The change was accepted; only reading the new settings failed.");
+        failure.note("The change was accepted, but the new settings could not be read.");
         throw;
     }
 }

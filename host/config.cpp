@@ -55,7 +55,7 @@ std::size_t number(const std::string& text, Range range) {
 
 const std::string& notEmpty(const std::string& text) {
     if (text.empty()) {
-        throw BadValue{"a non-empty text"};
+        throw BadValue{"a non-empty string"};
     }
     return text;
 }
@@ -138,7 +138,7 @@ std::vector<std::string> valuesOf(const Json::Value& value, Form form) {
         return {value.isIntegral() ? value.asString() : ""};
     case Form::text:
         if (!value.isString()) {
-            throw BadValue{"a text"};
+            throw BadValue{"a string"};
         }
         return {value.asString()};
     case Form::list:
@@ -151,7 +151,7 @@ std::vector<std::string> valuesOf(const Json::Value& value, Form form) {
         }
     }
     if (!value.isArray() || texts.size() != value.size()) {
-        throw BadValue{"a list of texts"};
+        throw BadValue{"a list of strings"};
     }
     return texts;
 }

@@ -99,7 +99,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     HttpServer server(app, possibleLimits(config, log), config.tls);
     const Json::Value ready = listenEverywhere(config, server, log);
     if (const auto started = velt::startEnabledServices(); !started) {
-        log.write("not every enabled service started: " + started.error().message);
+        log.write("some enabled services did not start: " + started.error().message);
     }
     if (const auto watched = velt::watchServices(); !watched) {
         log.write("cannot watch the services: " + watched.error().message);

@@ -42,11 +42,11 @@ std::string alternatives(const Json::Value& values) {
 
 std::string integerWords(const Json::Value& schema) {
     if (schema.isMember("minimum") && schema.isMember("maximum")) {
-        return "an integer from " + schema["minimum"].asString() + " to " + schema["maximum"].asString();
+        return "a number from " + schema["minimum"].asString() + " to " + schema["maximum"].asString();
     }
     return schema.isMember("minimum") && !schema.isMember("x-expected")
-               ? "an integer of at least " + schema["minimum"].asString()
-               : "an integer";
+               ? "a number of at least " + schema["minimum"].asString()
+               : "a number";
 }
 
 std::string wordsFor(const Json::Value& schema) {
@@ -61,7 +61,7 @@ std::string wordsFor(const Json::Value& schema) {
         return integerWords(schema);
     }
     if (type == "string") {
-        return schema["minLength"].asInt() > 0 ? "a non-empty text" : "a text";
+        return schema["minLength"].asInt() > 0 ? "a non-empty string" : "a string";
     }
     if (type == "array") {
         return schema["minItems"].asInt() > 0 ? "a list with at least one element" : "a list";

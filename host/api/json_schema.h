@@ -17,7 +17,7 @@ Json::Value flatSchema(const Json::Value& document, const Json::Value& part);
 /// The schema with bounds in place of each "format" of a number, for a validator that knows bounds only.
 Json::Value withBounds(Json::Value schema);
 
-/// What the schema expects at the path of property names and array indices: "an integer from 1 to 65535",
+/// What the schema expects at the path of property names and array indices: "a number from 1 to 65535",
 /// "true or false". "a different value" when the schema does not say.
 std::string expectationOf(const Json::Value& schema, const std::vector<std::string>& path);
 

@@ -14,7 +14,7 @@ namespace velt::host {
 /// A field with a wrong value.
 struct FieldError {
     std::string field;    ///< "portnum", "rules[2].name"
-    std::string expected; ///< "an integer from 1 to 65535"
+    std::string expected; ///< "a number from 1 to 65535"
 };
 
 /// A problem that no module took part in; its title is the reason phrase.

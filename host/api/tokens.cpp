@@ -31,7 +31,8 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     }
     const Json::Value& name = (*body)["name"];
     if (!isName(name)) {
-        return fieldProblem(422, {"name", "a text of 1 to 64 bytes without control and direction characters"},
+        return fieldProblem(422,
+                            {"name", "a string of 1 to 64 bytes without control and direction characters"},
                             noneMade, call.id);
     }
     const Json::Value& word = (*body)["role"];

@@ -89,7 +89,7 @@ public:
     virtual void deliver(const std::shared_ptr<const std::string>& event) = 0;
 };
 
-/// What the server asks of the application, which lies on a floor above and is not known here. Called by
+/// What the server asks of the application, which is on a floor above and is not known here. Called by
 /// several threads at once.
 class HttpHandler {
 public:

@@ -44,7 +44,7 @@ TrialFolder::TrialFolder(const std::filesystem::path& folder, bool forStop)
     }
     if (status.st_uid != ::geteuid() && !(forStop && ::geteuid() == 0)) {
         const std::string owner = userName(status.st_uid);
-        throw TrialError(name_ + " belongs to " + owner + ". " +
+        throw TrialError(name_ + " belongs to the user \"" + owner + "\". " +
                          (forStop ? "Stop it as that user, or as root."
                                   : "Start as that user, or stop the trial and remove " + name_ + "."));
     }

@@ -37,7 +37,7 @@ TrialPlace findPlace(const std::filesystem::path& folder) {
     }
     const passwd* const account = ::getpwnam("ftp"); // NOLINT(concurrency-mt-unsafe)
     if (account == nullptr) {
-        throw TrialError("There is no account ftp. Install the package proftpd-core, which makes it.");
+        throw TrialError("There is no account ftp. Install the package proftpd-core, which creates it.");
     }
     if (mayEnter(*account, folder)) {
         return {folder, false};

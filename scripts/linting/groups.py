@@ -59,7 +59,7 @@ class Group:
             for number, line in enumerate(text.splitlines(), 1):
                 header = INCLUDED.match(line)
                 if header:
-                    # Said again it would be one include too many; twice in one source it is.
+                    # Drop includes that an earlier source has; keep a source's own duplicates, which are findings.
                     line = "" if header[1] in included else line
                     own.add(header[1])
                 lines.append(line)

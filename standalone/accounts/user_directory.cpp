@@ -179,8 +179,8 @@ std::shared_ptr<const GroupSnapshot> Directory::groups() {
     return groups_;
 }
 
-// Nobody has to wait for a listing of users who looks up one account: each login to the FTP daemon is a
-// process of its own, for which that would be the first one.
+// Looking up one account must not wait for a listing: each FTP login is a new process, so the listing would
+// always be its first.
 Modules Directory::modules() {
     const std::lock_guard lock(mutex_);
     if (!isCurrent(modulesReadAt_)) {

@@ -43,8 +43,7 @@ constexpr auto largestId = static_cast<unsigned>(std::numeric_limits<int>::max()
 velt::Result<VELT_USER*> lookUpUser(const char* name) {
     VELT_ASSIGN_OR_RETURN(const velt::UserEntry user, velt::findUser(name));
     if (user.uid > largestId) {
-        return velt::Error(velt::ErrorNumber::invalid,
-                           "The number of user \"" + user.name + "\" is too large.");
+        return velt::Error(velt::ErrorNumber::invalid, "The user ID of \"" + user.name + "\" is too large.");
     }
     return internUser(user);
 }
@@ -53,7 +52,7 @@ velt::Result<VELT_GROUP*> lookUpGroup(const char* name) {
     VELT_ASSIGN_OR_RETURN(const velt::GroupEntry group, velt::findGroup(name));
     if (group.gid > largestId) {
         return velt::Error(velt::ErrorNumber::invalid,
-                           "The number of group \"" + group.name + "\" is too large.");
+                           "The group ID of \"" + group.name + "\" is too large.");
     }
     return internGroup(group);
 }

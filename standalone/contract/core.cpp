@@ -28,7 +28,7 @@ struct StringList : VLIBCSzList {
 
 int push(StringList& list, const char* text) {
     if (list.count == INT_MAX)
-        return fail(ErrorNumber::outOfMemory, "A list of texts is full.");
+        return fail(ErrorNumber::outOfMemory, "The list is full.");
     // Copied first: the text may be an entry of this list, and growing moves the entries.
     std::string copy(text);
     list.texts.push_back(std::move(copy));

@@ -7,7 +7,7 @@
 
 namespace {
 
-// What stands behind the handle. The public class has no fields.
+// What is behind the handle. The public class has no fields.
 struct LoadedUser : SDK::User {
     explicit LoadedUser(std::string text) : description(std::move(text)) {}
     std::string description;

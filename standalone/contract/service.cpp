@@ -38,8 +38,7 @@ int affect(Effect effect, const char* service, const std::function<Result<>(cons
 int setRunKey(const char* service, int value) {
     return affect(Effect::runKey, service, [service, value](const Daemon&) -> Result<> {
         if (value != keyAfterStart && value != keyAfterStop) {
-            return Error(ErrorNumber::invalid,
-                         "The run key " + std::to_string(value) + " is neither 1 nor 2.");
+            return Error(ErrorNumber::invalid, "Run key " + std::to_string(value) + ": expected 1 or 2.");
         }
         const auto file = statePath(paths::runKeys) / service;
         return replaceFile(file, std::to_string(value) + "\n", 0644);

@@ -14,7 +14,7 @@ LastSeen<SftpSettings>& lastSeenSettings() {
     return seen;
 }
 
-Result<> readRecord(_tag_VELT_SFTP_CONFIG_& record) {
+Result<> loadRecord(_tag_VELT_SFTP_CONFIG_& record) {
     lastSeenSettings().forget();
     VELT_ASSIGN_OR_RETURN(const SftpSettings settings, loadSftpSettings());
     record = _tag_VELT_SFTP_CONFIG_{};
@@ -38,9 +38,8 @@ Result<> storeSettings(const SftpSettings& wanted) {
 
 int VELTSFTPConfigGet(int which, _tag_VELT_SFTP_CONFIG_* out) {
     if (which != 1 || out == nullptr)
-        return velt::fail(velt::ErrorNumber::invalid,
-                          "The SFTP settings are record 1; a place for them is required.");
-    return velt::atBoundary([out] { return velt::readRecord(*out); });
+        return velt::fail(velt::ErrorNumber::invalid, "Expected record 1 and a place for the SFTP settings.");
+    return velt::atBoundary([out] { return velt::loadRecord(*out); });
 }
 
 int VELTSFTPConfigSet(int enable, int port) {

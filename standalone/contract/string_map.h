@@ -1,4 +1,4 @@
-// What stands behind the contract's map of texts.
+// What is behind the contract's map of texts.
 #ifndef VELT_STANDALONE_CONTRACT_STRING_MAP_H
 #define VELT_STANDALONE_CONTRACT_STRING_MAP_H
 

@@ -8,7 +8,7 @@
 
 namespace velt {
 
-/// A supervisor that is killed stays away: the next start finds what it left and begins anew.
+/// A supervisor that is killed stays away: the next start finds what it left and begins from scratch.
 class ChildLauncher : public SupervisorLauncher {
 public:
     explicit ChildLauncher(std::string_view daemon) : daemon_(daemon) {}

@@ -66,7 +66,8 @@ std::optional<PortConflict> conflictOfForm(const Question& question) {
     }
     if (range.first > range.last) {
         return PortConflict{range.first, "",
-                            "The range " + formatPortRange(range) + " ends before it begins."};
+                            "The port range is " + formatPortRange(range) +
+                                "; its first port has to be lower than its last."};
     }
     return std::nullopt;
 }

@@ -37,8 +37,8 @@ public:
         const DaemonState state = daemonState(daemon_);
         const bool lost = lostItsSupervisor(state);
         if (lost && !retryAt_) {
-            ::syslog(LOG_ERR, "%s lost its supervisor, process %d, and is started again",
-                     titleOf(daemon_).c_str(), static_cast<int>(state.supervisor.pid));
+            ::syslog(LOG_ERR, "%s lost its supervisor (process %d); restarting it", titleOf(daemon_).c_str(),
+                     static_cast<int>(state.supervisor.pid));
         }
         const bool missing = lost || (retryAt_ && !isServing(state));
         if (!missing) {
@@ -92,7 +92,7 @@ private:
             try {
                 std::ranges::for_each(daemons, &WatchedDaemon::look);
             } catch (const std::exception& error) {
-                ::syslog(LOG_ERR, "cannot look after the daemons: %s", error.what());
+                ::syslog(LOG_ERR, "cannot watch the daemons: %s", error.what());
             }
             lock.lock();
         }

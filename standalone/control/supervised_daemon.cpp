@@ -80,10 +80,10 @@ Result<> SupervisedDaemon::handOver(const std::filesystem::path& folder, const P
     if (!*answer) {
         return *answer;
     }
-    // The daemon serves: its start did not fail, even if it would come back with former settings.
+    // The daemon serves: its start did not fail, even if a restart would use its former settings.
     if (const auto kept = launcher_->keep(folder, order); !kept) {
-        ::syslog(LOG_ERR, "%s would come back with its former settings: %s", titleOf(daemon_).c_str(),
-                 kept.error().message.c_str());
+        ::syslog(LOG_ERR, "%s runs, but a restart would use its former settings: %s",
+                 titleOf(daemon_).c_str(), kept.error().message.c_str());
     }
     return {};
 }
@@ -118,14 +118,14 @@ Result<> SupervisedDaemon::stop() {
     DaemonState left = now;
     left.sessions.push_back(now.supervisor);
     if (!endLeftovers(left)) {
-        return failure("cannot be stopped", "some of its processes do not end");
+        return failure("cannot be stopped", "some of its processes did not end");
     }
     ::unlink(stateFile(statePath(paths::run), name_).c_str());
     return {};
 }
 
 DaemonState daemonState(const Daemon& daemon) {
-    return readDaemonState(stateFile(statePath(paths::run), daemon.name)).value_or(DaemonState{});
+    return loadDaemonState(stateFile(statePath(paths::run), daemon.name)).value_or(DaemonState{});
 }
 
 bool systemdKeepsSupervisors() {

@@ -31,7 +31,7 @@ Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const Daem
     // former settings with it.
     const ProcessResult started = runProcess({places_.systemctl, "restart", unit_}, {}, startLimit);
     if (started.exitCode == 0) {
-        const auto now = readDaemonState(stateFile(folder, daemon_.name));
+        const auto now = loadDaemonState(stateFile(folder, daemon_.name));
         return now && isServing(*now) ? Result<>()
                                       : Error("systemd reports a start, but the daemon does not serve");
     }

@@ -13,7 +13,7 @@ namespace velt {
 /// What the launcher uses of the machine.
 struct SystemdPlaces {
     std::string systemctl = "systemctl";
-    /// Units that are gone after a boot: what is to run then is decided anew from the stored settings.
+    /// Units that are gone after a boot: what is to run then is decided again from the stored settings.
     std::filesystem::path units = "/run/systemd/system";
 };
 

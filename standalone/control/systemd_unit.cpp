@@ -47,7 +47,7 @@ std::string renderUnit(const Daemon& daemon, const std::filesystem::path& folder
          << quoteUnitWord(folder.string()) << ' ' << quoteUnitWord(daemon.name)
          << '\n'
          // A supervisor that was killed comes back, one that says that its daemon does not start is not asked
-         // again. It starts the daemon anew itself.
+         // again. It starts the daemon again itself.
          << "Restart=on-abnormal\n"
          << "RestartSec=100ms\n"
          // The supervisor ends what it started, and its successor what is left of a killed one.

@@ -32,7 +32,7 @@ Result<> actAndReport(Effect effect, std::string_view subject, const std::functi
         return outcome;
     } catch (...) {
         // Part of it may have been done.
-        tell(Error("It ended with an exception."));
+        tell(Error("Unexpected exception."));
         throw;
     }
 }

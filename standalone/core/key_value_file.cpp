@@ -59,7 +59,7 @@ Result<> checkKeyValue(std::string_view key, std::string_view value) {
                      "The value of " + name + " is longer than " + std::to_string(longestValue) + " bytes.");
     if (std::any_of(value.begin(), value.end(), isControl))
         return Error(ErrorNumber::invalid,
-                     "The value of " + name + " contains a line end or another control character.");
+                     "The value of " + name + " contains a line break or control character.");
     return {};
 }
 

@@ -1,4 +1,4 @@
-// Where the platform keeps its state: every file lies below one root folder, "/" in production.
+// Where the platform keeps its state: every file is below one root folder, "/" in production.
 #ifndef VELT_STANDALONE_CORE_STATE_ROOT_H
 #define VELT_STANDALONE_CORE_STATE_ROOT_H
 

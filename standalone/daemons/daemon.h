@@ -19,7 +19,7 @@ namespace velt {
 struct DaemonPorts {
     VELT_FTP_PORT_RANGE range{};
     bool ofSessions = false; ///< each session takes one of the range; else the daemon listens on its one port
-    std::string use;         ///< in words: "the control connections of the FTP service"
+    std::string use;         ///< in words: "the FTP service"
 };
 
 /// A service that an administrator switches on and off; one daemon may serve several.

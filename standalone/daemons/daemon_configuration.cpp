@@ -8,11 +8,26 @@
 #include <algorithm>
 
 namespace velt {
+namespace {
+
+constexpr std::size_t longestPath = 1024;
+
+} // namespace
 
 bool isRenderable(const std::filesystem::path& path) {
     const std::string text = path.string();
-    return path.is_absolute() && text.size() <= 1024 && std::ranges::none_of(text, isControl) &&
+    return path.is_absolute() && text.size() <= longestPath && std::ranges::none_of(text, isControl) &&
            text.find_first_of("\"\\%*") == std::string::npos;
+}
+
+Result<> checkRenderable(const std::filesystem::path& path, const std::filesystem::path& folder) {
+    if (isRenderable(path)) {
+        return {};
+    }
+    const bool tooLong = path.native().size() > longestPath;
+    return Error(ErrorNumber::invalid,
+                 "Cannot use the folder " + folder.string() + ": its path " +
+                     (tooLong ? "is too long." : "may not contain \" \\ % * or control characters."));
 }
 
 Result<> runConfigurationTest(const std::string& label, const std::vector<std::string>& arguments) {

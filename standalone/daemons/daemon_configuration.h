@@ -14,6 +14,9 @@ namespace velt {
 /// the characters that mean something to a daemon even there.
 bool isRenderable(const std::filesystem::path& path);
 
+/// Fails, naming the administrator's folder that the path is below, unless the path is renderable.
+Result<> checkRenderable(const std::filesystem::path& path, const std::filesystem::path& folder);
+
 /// Runs the test that a daemon offers of its configuration. Fails, with the daemon's own words, when it
 /// refuses. `label` is the daemon's for people: "FTP".
 Result<> runConfigurationTest(const std::string& label, const std::vector<std::string>& arguments);

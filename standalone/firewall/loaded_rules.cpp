@@ -49,7 +49,7 @@ Result<> noteLoading() {
 void noteLoaded(std::string_view script, std::optional<std::uint32_t> before) {
     const auto now = rulesetGeneration();
     if (!before || !now || *now != *before + 1) {
-        return; // the note of the loading stands
+        return; // keep the note
     }
     if (const auto noted = replaceFile(noteFile(), note(*now, script), 0644); !noted) {
         ::syslog(LOG_WARNING, "%s", noted.error().message.c_str());

@@ -22,7 +22,7 @@ bool rulesAreInForce(std::string_view script);
 /// Notes that rules are about to be loaded.
 Result<> noteLoading();
 
-/// Notes that the script was loaded. `before` is the ruleset's generation of before that: when somebody else
+/// Notes that the script was loaded. `before` is the generation before loading: when somebody else
 /// made a change in between, the rules count as loaded, but not as in force.
 void noteLoaded(std::string_view script, std::optional<std::uint32_t> before);
 

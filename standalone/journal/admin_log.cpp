@@ -50,7 +50,8 @@ Result<LogDatabase*> currentDatabase(Connection& open) {
 std::optional<LogRetention> retentionIfReadable() {
     const Result<LogRetention> retention = loadRetention();
     if (!retention) {
-        syslog(LOG_WARNING, "administrator log: nothing is removed: %s", retention.error().message.c_str());
+        syslog(LOG_WARNING, "administrator log: cannot remove old entries: %s",
+               retention.error().message.c_str());
         return std::nullopt;
     }
     return *retention;
@@ -94,7 +95,7 @@ Result<> logEvent(int category, int level, unsigned event, const std::array<cons
 
 Result<std::vector<LogEntry>> queryLog(const LogFilter& filter) {
     if (filter.limit < 1 || filter.limit > longestPage) {
-        return Error(ErrorNumber::invalid, "A page of the administrator log has 1 to 1000 entries.");
+        return Error(ErrorNumber::invalid, "Page size: expected a number from 1 to 1000.");
     }
     Connection& open = connection();
     const std::lock_guard lock(open.mutex);

@@ -20,11 +20,11 @@ namespace {
 
 constexpr std::size_t longestLine = 65536;
 
-Error cannotWrite(const std::filesystem::path& path, const char* why) {
+Error cannotWrite(const std::filesystem::path& path, const std::string& why) {
     return {ErrorNumber::event, "Cannot write the event to " + path.string() + ": " + why + "."};
 }
 
-/// Its lock keeps other writers from adding their lines in between. Opened anew for each line: another
+/// Its lock keeps other writers from adding their lines in between. Opened again for each line: another
 /// writer, or a program of the administrator's, may have renamed it meanwhile.
 UniqueFd openLog(const std::filesystem::path& path) {
     return openLocked(path, O_RDWR | O_APPEND, 0640);
@@ -60,7 +60,7 @@ Result<> writeLine(int fd, off_t size, const std::string& line, const std::files
     }
     const int error = written < 0 ? errno : ENOSPC;
     if (::ftruncate(fd, size) != 0) {
-        return cannotWrite(path, "half a line stays in the file");
+        return cannotWrite(path, std::strerror(error) + std::string("; the last line is incomplete"));
     }
     return cannotWrite(path, std::strerror(error));
 }

@@ -89,7 +89,7 @@ int run(int count, char** arguments) {
     }
     umask(022);
     if (!becomeRoot()) {
-        return refuse("Cannot take on root's rights.");
+        return refuse("Cannot switch to root.");
     }
     velt::setStateRoot(arguments[1]);
     const auto remarks = velt::makeLoginView(*login, arguments[3]);

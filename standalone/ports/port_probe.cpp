@@ -16,7 +16,7 @@ namespace {
 int bindTo(int family, const sockaddr* address, socklen_t size) {
     const UniqueFd socket(::socket(family, SOCK_STREAM | SOCK_CLOEXEC, 0));
     const int on = 1;
-    // As the daemons do: connections of a former listener that still wait for their end do not count.
+    // As the daemons do: ignore connections of a former listener in TIME_WAIT.
     if (!socket || ::setsockopt(socket.get(), SOL_SOCKET, SO_REUSEADDR, &on, sizeof on) != 0 ||
         ::bind(socket.get(), address, size) != 0) {
         return errno;

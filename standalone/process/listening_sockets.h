@@ -20,8 +20,8 @@ struct ListeningSocket {
 /// the caller.
 std::vector<ListeningSocket> listeningSockets(pid_t pid = 0);
 
-/// Whether the process itself holds a listening socket on the port. Of a process that does not let this one
-/// see its sockets: whether its user has one there.
+/// Whether the process itself holds a listening socket on the port. If its sockets cannot be seen:
+/// whether its user has such a socket.
 bool listensOn(pid_t pid, int port);
 
 struct SocketOwner {

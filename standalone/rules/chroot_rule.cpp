@@ -79,7 +79,7 @@ Result<std::string> ownerOf(const ChrootRule& rule) {
         return group->name;
     }
     return Error(ErrorNumber::notFound, "There is no " + std::string(rule.isUser ? "user" : "group") +
-                                            " with the number " + std::to_string(rule.id) + ".");
+                                            " with the ID " + std::to_string(rule.id) + ".");
 }
 
 const ChrootRule* ruleFor(const std::vector<ChrootRule>& rules, uid_t uid, const std::vector<gid_t>& gids) {

@@ -42,7 +42,7 @@ Result<> checkValue(const char* services, const Setting& setting, std::span<char
     const std::string_view bytes(field.data(), field.size());
     const std::string_view text = bytes.substr(0, bytes.find('\0'));
     if (text.size() == bytes.size())
-        return refuse(nameOf(services, setting) + " does not end within its " + std::to_string(field.size()) +
+        return refuse(nameOf(services, setting) + " is longer than " + std::to_string(field.size() - 1) +
                       " bytes.");
     if (setting.type != SettingType::number)
         return {};
@@ -71,7 +71,7 @@ Result<> checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
     if (range.first < lowestPassivePort || range.first > schema::highestPort ||
         range.last < lowestPassivePort || range.last > schema::highestPort)
         return refuse("The passive port range is " + rangeText(range) +
-                      "; both ends have to be from 1024 to 65535.");
+                      "; expected ports from 1024 to 65535.");
     if (range.first > range.last)
         return refuse("The passive port range is " + rangeText(range) +
                       "; its first port has to be lower than its last.");

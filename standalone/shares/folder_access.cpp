@@ -51,7 +51,7 @@ Result<Access> folderAccess(const std::string& path, const Identity& who) {
     VELT_ASSIGN_OR_RETURN(const int answer,
                           askChild([&] { return askKernel(path.c_str(), who, changeIdentity); }));
     if (answer == cannotTell) {
-        return cannotAsk(path, "the account's rights cannot be taken on");
+        return cannotAsk(path, "cannot switch to the account");
     }
     return static_cast<Access>(answer);
 }

@@ -110,7 +110,7 @@ Result<> checkRoot(const Json::Value& root) {
         return damaged("\"version\": expected 1");
     }
     if (!root["shares"].isArray()) {
-        return damaged("\"shares\": expected an array");
+        return damaged("\"shares\": expected a list");
     }
     for (const std::string& key : root.getMemberNames()) {
         if (key != "version" && key != "shares") {

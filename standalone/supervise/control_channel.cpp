@@ -116,7 +116,7 @@ std::string encodeRequest(const ControlRequest& request) {
 }
 
 Result<ControlRequest> decodeRequest(const std::string& message) {
-    const Error malformed("the request was not understood");
+    const Error malformed("unknown request");
     const std::vector<std::string> fields = splitFields(message);
     const auto* const known = std::ranges::find(commandNames, fields.empty() ? "" : fields[0]);
     if (known == commandNames.end()) {

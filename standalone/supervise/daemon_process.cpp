@@ -85,7 +85,7 @@ Error DaemonProcess::ended(int waitStatus) {
     readOutput();
     id_ = {};
     std::string words = takeLastWords();
-    if (WIFSIGNALED(waitStatus)) { // then its words were about something else
+    if (WIFSIGNALED(waitStatus)) { // its output does not explain a signal
         return Error("it was ended by signal " + std::to_string(WTERMSIG(waitStatus)));
     }
     return Error(words.empty() ? "it ended with status " + std::to_string(WEXITSTATUS(waitStatus))
@@ -116,14 +116,14 @@ void DaemonProcess::readOutput() {
             } else if (partialLine_.size() < longestLine) {
                 partialLine_ += character;
             } else if (partialLine_.size() == longestLine) {
-                partialLine_ += "…"; // so that nobody takes it for the whole; a full stop would be taken off
+                partialLine_ += "…"; // marks the cut; "..." would be trimmed as full stops
             }
         }
     }
 }
 
 void DaemonProcess::takeLine(std::string line) {
-    // The lines end in state files, logs and answers, where control characters have no business.
+    // The lines reach state files, logs and answers; remove control characters.
     std::erase_if(line, isControl);
     if (line.empty()) {
         return;

@@ -103,7 +103,7 @@ std::filesystem::path orderFile(const std::filesystem::path& folder, std::string
     return folder / (std::string(daemon) + ".order");
 }
 
-std::optional<DaemonState> readDaemonState(const std::filesystem::path& file) {
+std::optional<DaemonState> loadDaemonState(const std::filesystem::path& file) {
     std::ifstream input(file);
     std::string line;
     if (!std::getline(input, line) || line != firstLine) {
@@ -119,7 +119,7 @@ std::optional<DaemonState> readDaemonState(const std::filesystem::path& file) {
     return state;
 }
 
-Result<> writeDaemonState(const std::filesystem::path& file, const DaemonState& state) {
+Result<> storeDaemonState(const std::filesystem::path& file, const DaemonState& state) {
     std::filesystem::path fresh = file;
     fresh += ".new";
     std::ofstream output(fresh, std::ios::trunc);

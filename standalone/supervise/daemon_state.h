@@ -39,10 +39,10 @@ std::filesystem::path orderFile(const std::filesystem::path& folder, std::string
 
 /// Nothing when there is no such file, not one of this form, or one from before the machine started: its
 /// processes are gone, and others may have their numbers.
-std::optional<DaemonState> readDaemonState(const std::filesystem::path& file);
+std::optional<DaemonState> loadDaemonState(const std::filesystem::path& file);
 
 /// Replaces the file; it is whole at every moment.
-Result<> writeDaemonState(const std::filesystem::path& file, const DaemonState& state);
+Result<> storeDaemonState(const std::filesystem::path& file, const DaemonState& state);
 
 /// Whether the daemon does what its file says: it lives and listens on its ports itself.
 bool isServing(const DaemonState& state);

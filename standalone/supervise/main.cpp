@@ -57,7 +57,7 @@ Result<DaemonOrder> readOrder(const std::string& folder, const std::string& daem
     std::ifstream file(velt::orderFile(folder, daemon), std::ios::binary);
     const auto request = velt::decodeRequest({std::istreambuf_iterator<char>(file), {}});
     if (!request || request->command != velt::Command::start) {
-        return Error("nothing in " + folder + " says what to start");
+        return Error(folder + " has no valid order for " + daemon);
     }
     return request->order;
 }
@@ -69,7 +69,7 @@ void reportToManager(const Result<>& started) {
 void reportToCaller(const Result<>& started) {
     const std::string text = started ? "ready" : "failed " + started.error().message;
     if (::write(reportDescriptor, text.data(), text.size()) < 0) {
-        ::syslog(LOG_WARNING, "nobody heard: %s", text.c_str());
+        ::syslog(LOG_WARNING, "cannot report to the caller: %s (%s)", std::strerror(errno), text.c_str());
     }
     ::close(reportDescriptor);
 }
@@ -121,7 +121,8 @@ int superviseForManager(const std::string& folder, const std::string& daemon) {
 int superviseDetached(int argc, char** argv) {
     const auto ports = parsePorts(argv[4]);
     if (!ports) {
-        std::fprintf(stderr, "velt-supervise: expected ports, not \"%s\"\n", argv[4]);
+        std::fprintf(stderr, "velt-supervise: PORTS: expected numbers from 1 to 65535, not \"%s\"\n",
+                     argv[4]);
         return 2;
     }
     const DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};

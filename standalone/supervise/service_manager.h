@@ -1,4 +1,4 @@
-// Word to the service manager that started this process, after the protocol of sd_notify(3).
+// Notifies the service manager that started this process, after the protocol of sd_notify(3).
 #ifndef VELT_STANDALONE_SUPERVISE_SERVICE_MANAGER_H
 #define VELT_STANDALONE_SUPERVISE_SERVICE_MANAGER_H
 

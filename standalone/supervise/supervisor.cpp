@@ -46,7 +46,7 @@ std::string statusLine(const DaemonState& state) {
     case RunState::running:
         return "STATUS=the daemon serves";
     case RunState::paused:
-        return "STATUS=paused: only the sessions that were open go on";
+        return "STATUS=paused: open sessions continue";
     case RunState::failed:
         return "STATUS=the daemon does not serve: " + state.reason;
     case RunState::stopped:
@@ -68,9 +68,9 @@ Result<> Supervisor::begin(const DaemonOrder& order) {
     if (!signals_) {
         return Error(std::string("cannot wait for signals: ") + std::strerror(errno));
     }
-    const auto former = readDaemonState(stateFile(folder_, name_));
+    const auto former = loadDaemonState(stateFile(folder_, name_));
     if (former && !endLeftovers(*former)) {
-        return Error("the former daemon, process " + std::to_string(former->daemon.pid) + ", does not end");
+        return Error("the former daemon, process " + std::to_string(former->daemon.pid) + ", did not end");
     }
     VELT_ASSIGN_OR_RETURN(auto control, ControlListener::open(folder_, name_));
     control_.emplace(std::move(control));
@@ -91,8 +91,7 @@ Result<> Supervisor::takeLock() {
     if (!lock_) {
         return Error("cannot open " + file.string() + ": " + std::strerror(errno));
     }
-    return ::flock(lock_.get(), LOCK_EX | LOCK_NB) == 0 ? Result<>()
-                                                        : Error("another supervisor of it is running");
+    return ::flock(lock_.get(), LOCK_EX | LOCK_NB) == 0 ? Result<>() : Error("it already has a supervisor");
 }
 
 Result<> Supervisor::startDaemon(Clock::time_point deadline) {
@@ -165,7 +164,7 @@ Result<> Supervisor::stop() {
     const bool ended = endProcesses([] { return descendantsOf(::getpid()); }, patience);
     settleDaemon();
     if (!ended) {
-        return Error("some of its processes do not end");
+        return Error("some of its processes did not end");
     }
     ::unlink(stateFile(folder_, name_).c_str());
     finished_ = true;
@@ -181,7 +180,7 @@ Result<> Supervisor::endDaemon() {
         [&daemon] { return isAlive(daemon) ? std::vector{daemon} : std::vector<ProcessId>(); }, patience);
     settleDaemon();
     return ended ? Result<>()
-                 : Error("the running daemon, process " + std::to_string(daemon.pid) + ", does not end");
+                 : Error("the running daemon, process " + std::to_string(daemon.pid) + ", did not end");
 }
 
 /// Takes note of an end that was asked for, before reapChildren() sees it and has the daemon started again.
@@ -250,7 +249,7 @@ void Supervisor::publish(RunState state, std::string reason) {
     state_ = state;
     DaemonState record;
     record.state = state;
-    if (!finished_) { // who is named there and gone was killed
+    if (!finished_) { // a supervisor that is listed but not alive counts as killed
         record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
     }
     record.daemon = daemon_.id();
@@ -261,7 +260,7 @@ void Supervisor::publish(RunState state, std::string reason) {
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);
     tellServiceManager(statusLine(record));
-    if (const auto written = writeDaemonState(stateFile(folder_, name_), record); !written) {
+    if (const auto written = storeDaemonState(stateFile(folder_, name_), record); !written) {
         ::syslog(LOG_ERR, "%s", written.error().message.c_str());
     }
 }

@@ -6,7 +6,7 @@ TEST_F(SettingsTest, GetShowsATableInAFixedOrder) {
     const RunResult result = run({"sftp", "get"});
     EXPECT_EQ(result.code, 0);
     EXPECT_EQ(result.out, "SETTING  VALUE  MEANING\n"
-                          "enable   off    SFTP runs\n"
+                          "enable   off    SFTP is enabled\n"
                           "portnum  22     Port of SFTP\n");
     EXPECT_EQ(result.err, "");
 }
@@ -215,7 +215,8 @@ TEST_F(SettingsTest, ANumberOutOfItsRangeAsksNothing) {
 TEST_F(SettingsTest, HelpHasTheFactsOfEachSetting) {
     const std::string help = run({"ftp", "set", "--help"}).out;
     for (const char* line :
-         {"  timeout                 Idle time after which a session ends; 0 is never (seconds, 0 to 86400, "
+         {"  timeout                 Idle time after which a session ends; 0 means never (seconds, 0 to "
+          "86400, "
           "default 300)\n",
           "  portnum                 Port of FTP and FTPS (1 to 65535, default 21)\n",
           "  enable_fxp              Transfers between two servers are allowed (on or off, default off)\n",

@@ -192,7 +192,7 @@ TEST(Config, TheCommandLineGoesBeforeTheFile) {
 TEST(Config, AnOptionThatIsWrongIsNamed) {
     EXPECT_EQ(refusal({}), "No module is given: use --module FILE.");
     EXPECT_EQ(refusal({"--module"}), "--module needs a value.");
-    EXPECT_EQ(refusal({"--module="}), "--module takes a non-empty text, not \"\".");
+    EXPECT_EQ(refusal({"--module="}), "--module takes a non-empty string, not \"\".");
     for (const char* word : {"module.so", "--nonsense", "--", "-module", "", "--max_body=1", "--Module=a"}) {
         EXPECT_EQ(refusal({word}), "\"" + std::string(word) + "\" is not an option. --help lists them.");
     }
@@ -233,14 +233,14 @@ TEST(Config, AKeyThatIsWrongIsNamed) {
         {R"("max-body":12)", "a number from 1024 to 1073741824"},
         {R"("print-ready":1)", "true or false"},
         {R"("allow-remote":"yes")", "true or false"},
-        {R"("socket":7)", "a text"},
-        {R"("socket":["/s"])", "a text"},
-        {R"("socket":null)", "a text"},
-        {R"("socket":"")", "a non-empty text"},
-        {R"("listen":"127.0.0.1:80")", "a list of texts"},
-        {R"("listen":["127.0.0.1:80",7])", "a list of texts"},
-        {R"("listen":{})", "a list of texts"},
-        {R"("host-name":[""])", "a non-empty text"},
+        {R"("socket":7)", "a string"},
+        {R"("socket":["/s"])", "a string"},
+        {R"("socket":null)", "a string"},
+        {R"("socket":"")", "a non-empty string"},
+        {R"("listen":"127.0.0.1:80")", "a list of strings"},
+        {R"("listen":["127.0.0.1:80",7])", "a list of strings"},
+        {R"("listen":{})", "a list of strings"},
+        {R"("host-name":[""])", "a non-empty string"},
     };
     for (const auto& [pair, expected] : wrong) {
         const std::size_t colon = pair.find(':');

@@ -148,7 +148,7 @@ TEST_F(HostRecord, aStopFinishesTheWriteThatRuns) {
     }
     EXPECT_EQ(stopHost(), 0);
     writer.join();
-    EXPECT_TRUE(result.exitCode == 0 || contains(result.errors, "only reading the new settings failed"))
+    EXPECT_TRUE(result.exitCode == 0 || contains(result.errors, "but the new settings could not be read"))
         << result.errors;
     EXPECT_EQ(fetchHome(), "alice") << "the services go on without the host";
     startHost();

@@ -137,10 +137,10 @@ TEST_F(HostRefusal, aWordThatIsNoValueAsksNothing) {
 TEST_F(HostRefusal, aRefusedValueIsExplained) {
     expectFailure({"call", "VELT.Core.FileServ.FTP", "3", "set",
                    R"({"enable_ftp": true, "enable_ftps": false, "utf8_mode": 9})"},
-                  3, "utf8_mode: expected an integer from 0 to 2");
+                  3, "utf8_mode: expected a number from 0 to 2");
     expectFailure(
         {"call", "VELT.Core.FileServ.FTP.SFTP", "1", "set", R"({"enable": true, "portnum": 70000})"}, 3,
-        "portnum: expected an integer from 1 to 65535");
+        "portnum: expected a number from 1 to 65535");
     expectFailure({"call", "VELT.Core.FileServ.FTP", "3", "set", R"({"enable_ftp": "yes"})"}, 3,
                   "enable_ftp: expected true or false");
     expectFailure({"call", "VELT.Core.FileServ.FTP", "4", "set"}, 3, "There is nothing");

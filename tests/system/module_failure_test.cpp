@@ -25,15 +25,15 @@ protected:
 TEST_F(ModuleFailure, saysWhyARangeIsRefused) {
     ASSERT_EQ(setFtp().code, 0);
     expectRefusal(R"({"custom_port_range": true, "custom_port": "40000:30000"})", rangeConflict,
-                  "The range 40000-30000 ends before it begins.");
+                  "The port range is 40000-30000; its first port has to be lower than its last.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "2100:2200"})", rangeConflict,
-                  "Port 2121 is taken by the control connections of the FTP service.");
+                  "Port 2121 is taken by the FTP service.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "30000:70000"})", rangeConflict,
                   "Port 70000: expected a port from 1 to 65535.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "30000:30000"})", operationFailed,
                   "The passive port range has only the port 30000; the FTP daemon needs two ports or more.");
     expectRefusal(R"({"custom_port_range": true, "custom_port": "900:910"})", operationFailed,
-                  "The passive port range is 900 to 910; both ends have to be from 1024 to 65535.");
+                  "The passive port range is 900 to 910; expected ports from 1024 to 65535.");
     EXPECT_EQ(getFtp()["custom_port_range"], false);
 }
 

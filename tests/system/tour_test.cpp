@@ -177,11 +177,11 @@ TEST_F(QuickStart, anotherUserIsToldWhoseItIs) {
     const std::vector<std::string> asAlice{"setpriv", "--reuid", "alice",
                                            "--regid", "alice",   "--clear-groups"};
     const std::string start =
-        "var/ belongs to root. Start as that user, or stop the trial and remove var/.\n1\n";
+        "var/ belongs to the user \"root\". Start as that user, or stop the trial and remove var/.\n1\n";
     EXPECT_EQ(run(tree_, startBuilt + "; echo $?", asAlice), start);
     EXPECT_EQ(run(tree_, "scripts/start; echo $?", asAlice), start) << "before anything is built";
     EXPECT_EQ(run(tree_, "scripts/start --stop; echo $?", asAlice),
-              "var/ belongs to root. Stop it as that user, or as root.\n1\n");
+              "var/ belongs to the user \"root\". Stop it as that user, or as root.\n1\n");
     fs::permissions(tree_, fs::perms(0755));
     EXPECT_EQ(run(tree_, "scripts/start; echo $?", asAlice),
               "You may not write to /mnt/tour. Start as root, or from a copy of your own.\n1\n");
@@ -193,8 +193,7 @@ TEST_F(QuickStart, aPathThatTheDaemonsCannotHoldIsRefusedAtOnce) {
         const fs::path odd = fs::path("/mnt") / name;
         furnishTree(odd);
         const std::string refusal =
-            "The FTP daemon's configuration cannot hold a path with \" \\ % or * in it: " + odd.string() +
-            "\n1\n";
+            "Cannot use the folder " + odd.string() + ": its path may not contain \" \\ % or *.\n1\n";
         EXPECT_EQ(run("'" + odd.string() + "'", "scripts/start; echo $?"), refusal);
         EXPECT_EQ(run("'" + odd.string() + "'", startBuilt + "; echo $?"), refusal);
         EXPECT_FALSE(fs::exists(odd / "var"));
@@ -315,7 +314,7 @@ TEST_F(QuickStart, worksWithoutRootsRights) {
     EXPECT_TRUE(contains(rebuilt, "veltd has been rebuilt; restarting it.\nveltd is running as process "))
         << rebuilt;
     EXPECT_TRUE(contains(rebuilt, "127.0.0.1:2121, on and off")) << rebuilt;
-    EXPECT_TRUE(contains(run(tree_, startHere), "var/ belongs to carol."))
+    EXPECT_TRUE(contains(run(tree_, startHere), "var/ belongs to the user \"carol\"."))
         << "root takes over what is carol's";
     run(tree_, "scripts/start --stop");
     fs::remove_all(built);

@@ -14,7 +14,7 @@ constexpr std::array serviceNames{
     ServiceName{"ftpd-ssl", "ftps"},
 };
 
-Result<DaemonSettings> readSettings() {
+Result<DaemonSettings> loadSettings() {
     VELT_ASSIGN_OR_RETURN(const auto stored, loadFtpSettings());
     const auto& record = stored.record;
     const int control = controlPort(record);
@@ -22,7 +22,7 @@ Result<DaemonSettings> readSettings() {
     return DaemonSettings{
         {{"ftp", (record.service_flags & VELT_FTP_SERVICE_PLAIN) != 0},
          {"ftps", (record.service_flags & VELT_FTP_SERVICE_TLS) != 0}},
-        {{{control, control}, false, "the control connections of the FTP service"},
+        {{{control, control}, false, "the FTP service"},
          {passive, true, "the passive range " + formatPortRange(passive) + " of the FTP service"}}};
 }
 
@@ -39,7 +39,7 @@ const Daemon ftpDaemon{
     .apiName = "ftp",
     .portName = "ftp",
     .serviceNames = serviceNames,
-    .settings = readSettings,
+    .settings = loadSettings,
     .plan = planFtpDaemon,
     .test = testStored,
 };

@@ -37,7 +37,7 @@ Result<> checkAnonymousAccount(const FtpSettings& settings) {
         return Error(ErrorNumber::invalid, "Anonymous FTP needs the account \"ftp\", which does not exist.");
     }
     if (account->uid == 0) {
-        return Error(ErrorNumber::invalid, "Anonymous FTP cannot use the account \"ftp\", which is root's.");
+        return Error(ErrorNumber::invalid, "Anonymous FTP cannot use the account \"ftp\": its user ID is 0.");
     }
     return {};
 }
@@ -93,11 +93,8 @@ Result<ProftpdPlaces> ownPlaces() {
     // As long as the place in the plan's own folder, whose name is known only when all of this is.
     places.anonymousShare = places.runFolder / "configurations" / std::string(64, '0') / "anonymous";
     places.ipv6 = hasIPv6();
-    if (!isRenderable(places.anonymousShare) || !isRenderable(places.loginProgram)) {
-        return Error(ErrorNumber::invalid,
-                     "The folder " + places.stateRoot.string() + " or " + places.moduleFolder.string() +
-                         " has a name that the FTP daemon's configuration cannot hold.");
-    }
+    VELT_RETURN_IF_ERROR(checkRenderable(places.anonymousShare, places.stateRoot));
+    VELT_RETURN_IF_ERROR(checkRenderable(places.loginProgram, places.moduleFolder));
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
     places.loopbackOnly = network.loopbackOnly;
     return places;

@@ -12,8 +12,8 @@ namespace velt {
 
 class ScratchFolder;
 
-/// What goes into the configuration beside the settings, found out anew: places, certificate (made when it is
-/// missing and needed), the rights of this process.
+/// What goes into the configuration beside the settings, determined at each call: places, certificate (made
+/// when it is missing and needed), the rights of this process.
 struct FtpSurroundings {
     ProftpdPlaces places;
     std::string certificateFingerprint;             ///< "" where FTPS is off

@@ -61,7 +61,7 @@ Result<> makeMissing(const std::vector<std::filesystem::path>& keys) {
     return {};
 }
 
-// A configuration under test names keys also where none may be stored.
+// A configuration under test needs keys even where none may be stored.
 Result<HostKeys> throwAwayKeys() {
     VELT_ASSIGN_OR_RETURN(auto folder, ScratchFolder::make());
     HostKeys keys{keysIn(folder.path()), std::make_shared<ScratchFolder>(std::move(folder))};

@@ -14,7 +14,7 @@ constexpr std::array dropIns{
     UnitDropIn{"ssh.service.d/velt-sftp.conf", "[Service]\nRuntimeDirectoryPreserve=yes\n"},
 };
 
-Result<DaemonSettings> readSettings() {
+Result<DaemonSettings> loadSettings() {
     VELT_ASSIGN_OR_RETURN(const auto stored, loadSftpSettings());
     return DaemonSettings{{{"sftp", stored.enabled}},
                           {{{stored.port, stored.port}, false, "the SFTP service"}}};
@@ -35,7 +35,7 @@ const Daemon sftpDaemon{
     .serviceNames = serviceNames,
     .canPause = true,
     .dropIns = dropIns,
-    .settings = readSettings,
+    .settings = loadSettings,
     .plan = planSftpDaemon,
     .test = testStored,
 };

@@ -21,7 +21,7 @@
 namespace velt {
 namespace {
 
-// The daemon starts itself anew for each connection and needs its absolute path for that.
+// The daemon starts itself again for each connection and needs its absolute path for that.
 constexpr const char* program = "/usr/sbin/sshd";
 
 // The daemon has this folder's place built in, so it does not follow the state root; it only has to be there.
@@ -42,11 +42,7 @@ struct Rendering {
 Result<Rendering> render(const SftpSettings& settings) {
     VELT_RETURN_IF_ERROR(makeSeparationFolder());
     VELT_ASSIGN_OR_RETURN(auto keys, hostKeys());
-    if (!isRenderable(keys.files.front())) {
-        return Error(ErrorNumber::invalid,
-                     "The folder " + statePath("/").string() +
-                         " has a name that the SFTP daemon's configuration cannot hold.");
-    }
+    VELT_RETURN_IF_ERROR(checkRenderable(keys.files.front(), statePath("/")));
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
     std::string text = renderSshd(settings, {keys.files, geteuid() == 0, network.loopbackOnly});
     return Rendering{std::move(text), std::move(keys)};

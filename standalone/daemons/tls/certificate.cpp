@@ -61,14 +61,14 @@ Result<ServerCertificate> load(const Pair& pair) {
     }
     const KeyOwner key = parseKey(*keyText);
     if (!key) {
-        return refuse(pair.key, "does not contain a PEM private key without a passphrase");
+        return refuse(pair.key, "does not contain an unencrypted PEM private key");
     }
     const int kind = EVP_PKEY_get_base_id(key.get());
     if (kind != EVP_PKEY_RSA && kind != EVP_PKEY_EC) {
-        return refuse(pair.key, "contains a key that is neither RSA nor an elliptic-curve key");
+        return refuse(pair.key, "contains an unsupported key; expected an RSA or elliptic-curve key");
     }
     if (X509_check_private_key(certificate.get(), key.get()) != 1) {
-        return refuse(pair.key, "is not the key of the certificate next to it");
+        return refuse(pair.key, "does not match the certificate");
     }
     return ServerCertificate{pair.certificate, pair.key, kind == EVP_PKEY_RSA,
                              sha256(*certificateText + *keyText), nullptr};
@@ -93,7 +93,7 @@ Result<> makeOwn(const Pair& pair) {
     return replaceFile(pair.certificate, made.certificate, 0644);
 }
 
-// A configuration under test names a certificate also where none may be stored.
+// A configuration under test needs a certificate even where none may be stored.
 Result<ServerCertificate> throwAway() {
     VELT_ASSIGN_OR_RETURN(auto made, ScratchFolder::make());
     const auto folder = std::make_shared<ScratchFolder>(std::move(made));

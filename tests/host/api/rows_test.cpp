@@ -60,8 +60,8 @@ TEST_F(HostRows, ARefusedParameterIsExplained) {
     EXPECT_EQ(problem["request_id"], answer.header("x-request-id"));
     ASSERT_EQ(problem["errors"].size(), 1U);
     EXPECT_EQ(problem["errors"][0]["field"], "portnum");
-    EXPECT_EQ(problem["errors"][0]["expected"], "an integer from 1 to 65535");
-    EXPECT_EQ(problem["detail"], "Invalid port value of input. portnum: expected an integer from 1 to 65535. "
+    EXPECT_EQ(problem["errors"][0]["expected"], "a number from 1 to 65535");
+    EXPECT_EQ(problem["detail"], "Invalid port value of input. portnum: expected a number from 1 to 65535. "
                                  "Nothing was changed.");
 }
 
@@ -80,8 +80,8 @@ TEST_F(HostRows, EveryWrongFieldIsNamed) {
         errors[each["field"].asString()] = each["expected"].asString();
     }
     const std::map<std::string, std::string> expected{{"enable_ftp", "true or false"},
-                                                      {"timeout", "an integer: 0 to 86400"},
-                                                      {"utf8_mode", "an integer from 0 to 2"}};
+                                                      {"timeout", "a number: 0 to 86400"},
+                                                      {"utf8_mode", "a number from 0 to 2"}};
     EXPECT_EQ(errors, expected);
 }
 

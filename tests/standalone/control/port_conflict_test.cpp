@@ -91,7 +91,8 @@ TEST_F(PortConflictTest, PortsOutsideTheirRangeConflict) {
 
 TEST_F(PortConflictTest, ARangeUpsideDownConflicts) {
     EXPECT_NE(IsPortConflict("ftp", 40010, 40000), 0);
-    EXPECT_EQ(lastErrorSentence(), "The range 40010-40000 ends before it begins.");
+    EXPECT_EQ(lastErrorSentence(),
+              "The port range is 40010-40000; its first port has to be lower than its last.");
 }
 
 TEST_F(PortConflictTest, FreePortsAreNoConflict) {
@@ -104,7 +105,7 @@ TEST_F(PortConflictTest, FreePortsAreNoConflict) {
 TEST_F(PortConflictTest, TheOtherServicesPortsConflict) {
     expectConflict("ftp", sftpPort_, sftpPort_, sftpPort_, "the SFTP service");
     expectConflict("ftp", sftpPort_ - 5, sftpPort_ + 5, sftpPort_, "the SFTP service");
-    expectConflict("ssh", ftpPort_, ftpPort_, ftpPort_, "the control connections of the FTP service");
+    expectConflict("ssh", ftpPort_, ftpPort_, ftpPort_, "the FTP service");
     expectConflict("ssh", 55536, 55536, 55536, "the passive range 55536-55899 of the FTP service");
     storeFtp(45000, 45010);
     expectConflict("ssh", 45010, 45010, 45010, "the passive range 45000-45010 of the FTP service");
@@ -112,7 +113,7 @@ TEST_F(PortConflictTest, TheOtherServicesPortsConflict) {
 }
 
 TEST_F(PortConflictTest, APassiveRangeMayNotHoldTheControlPort) {
-    expectConflict("ftp", ftpPort_ - 1, ftpPort_ + 1, ftpPort_, "the control connections of the FTP service");
+    expectConflict("ftp", ftpPort_ - 1, ftpPort_ + 1, ftpPort_, "the FTP service");
 }
 
 TEST_F(PortConflictTest, AServicesOwnPortsAreNoConflict) {
@@ -124,7 +125,7 @@ TEST_F(PortConflictTest, AServicesOwnPortsAreNoConflict) {
 }
 
 TEST_F(PortConflictTest, AnyOtherServiceMustAvoidBoth) {
-    expectConflict("web", ftpPort_, ftpPort_, ftpPort_, "the control connections of the FTP service");
+    expectConflict("web", ftpPort_, ftpPort_, ftpPort_, "the FTP service");
     expectConflict("web", sftpPort_, sftpPort_, sftpPort_, "the SFTP service");
     EXPECT_NE(IsPortConflict(nullptr, sftpPort_, sftpPort_), 0);
 }

@@ -101,7 +101,7 @@ TEST_F(Effects, AreReportedAfterTheyWereDone) {
     setEffectHook([](Effect, std::string_view) { return EffectDecision(Result<>()); });
     EXPECT_TRUE(perform(Effect::store, "undone", refused));
     EXPECT_EQ(reported, (std::vector<std::string>{"start ftpd", "store inner", "start outer: Refused.",
-                                                  "stop ftpd: It ended with an exception."}));
+                                                  "stop ftpd: Unexpected exception."}));
 }
 
 TEST_F(Effects, HaveAHookForEachThread) {

@@ -106,7 +106,7 @@ TEST_F(KeyValueFile, RefusesAValueThatWouldNotStayInItsLine) {
     ASSERT_TRUE(writeKeyValue(file_, "key", "old"));
     for (const std::string value : {"a\nother=1", "a\rb", "a\tb", "\x01", "\x7f"}) {
         EXPECT_EQ(test::messageOf(writeKeyValue(file_, "key", value)),
-                  "The value of key contains a line end or another control character.");
+                  "The value of key contains a line break or control character.");
     }
     EXPECT_FALSE(writeKeyValue(file_, "key", std::string_view("a\0b", 3)));
     EXPECT_EQ(test::messageOf(writeKeyValue(file_, "key", std::string(4097, 'x'))),

@@ -48,7 +48,7 @@ protected:
         ASSERT_EQ(messageOf(storeFtpSettings(settings)), "");
     }
 
-    /// "2121-2121 the control connections of the FTP service; ..."
+    /// "2121-2121 the FTP service; ..."
     static std::string portsOf(const Daemon& daemon) {
         const auto settings = daemon.settings();
         std::string text = messageOf(settings);
@@ -64,13 +64,13 @@ protected:
 
 TEST_F(DaemonSettingsTest, listThePortsInForce) {
     storeFtp(0);
-    EXPECT_EQ(portsOf(ftpDaemon), "2121-2121 the control connections of the FTP service; "
+    EXPECT_EQ(portsOf(ftpDaemon), "2121-2121 the FTP service; "
                                   "55536-55899 sessions: the passive range 55536-55899 of the FTP service; ");
     storeFtp(0, 40000);
     EXPECT_NE(portsOf(ftpDaemon).find("sessions: the passive range 55536-55899"), std::string::npos)
         << "half a range is none";
     storeFtp(0, 40000, 40100);
-    EXPECT_EQ(portsOf(ftpDaemon), "2121-2121 the control connections of the FTP service; "
+    EXPECT_EQ(portsOf(ftpDaemon), "2121-2121 the FTP service; "
                                   "40000-40100 sessions: the passive range 40000-40100 of the FTP service; ");
     ASSERT_EQ(messageOf(storeSftpSettings({false, 2222})), "");
     EXPECT_EQ(portsOf(sftpDaemon), "2222-2222 the SFTP service; ");

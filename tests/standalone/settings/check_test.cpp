@@ -55,11 +55,11 @@ TEST(CheckFtp, ThePortIsADecimalNumberFrom1To65535) {
 }
 
 TEST(CheckFtp, TextsEndWithinTheirFields) {
-    EXPECT_EQ(problemAfter(port("00000021")), "The FTP setting portnum does not end within its 8 bytes.");
+    EXPECT_EQ(problemAfter(port("00000021")), "The FTP setting portnum is longer than 7 bytes.");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) {
                   std::memset(settings.record.anonymous_chroot_share, 'x', 492);
               }),
-              "The FTP setting anonymous_chroot_share does not end within its 492 bytes.");
+              "The FTP setting anonymous_chroot_share is longer than 491 bytes.");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) {
                   std::memset(settings.record.anonymous_chroot_share, 'x', 491);
               }),
@@ -70,11 +70,11 @@ TEST(CheckFtp, ThePassiveRangeGoesUpwardsFrom1024To65535) {
     EXPECT_EQ(problemAfter(range(1024, 65535)), "");
     EXPECT_EQ(problemAfter(range(50000, 50001)), "");
     EXPECT_EQ(problemAfter(range(1023, 2000)),
-              "The passive port range is 1023 to 2000; both ends have to be from 1024 to 65535.");
+              "The passive port range is 1023 to 2000; expected ports from 1024 to 65535.");
     EXPECT_EQ(problemAfter(range(60000, 65536)),
-              "The passive port range is 60000 to 65536; both ends have to be from 1024 to 65535.");
+              "The passive port range is 60000 to 65536; expected ports from 1024 to 65535.");
     EXPECT_EQ(problemAfter(range(-5, INT_MAX)),
-              "The passive port range is -5 to 2147483647; both ends have to be from 1024 to 65535.");
+              "The passive port range is -5 to 2147483647; expected ports from 1024 to 65535.");
     EXPECT_EQ(problemAfter(range(50001, 50000)),
               "The passive port range is 50001 to 50000; its first port has to be lower than its last.");
     EXPECT_EQ(problemAfter(range(50000, 50000)), "The passive port range has only the port 50000; the FTP "

@@ -13,19 +13,19 @@ constexpr const char* goldenFtp =
 # takes effect when the service starts next.
 version = 1
 
-# Services that run: 1 is FTP, 2 is FTPS, 3 is both (default 0).
+# Enabled services: 0 none, 1 FTP, 2 FTPS, 3 both (default 0).
 service_flags = 0
 
-# Idle time after which a session ends; 0 is never (seconds, 0 to 86400, default 300).
+# Idle time after which a session ends; 0 means never (seconds, 0 to 86400, default 300).
 timeout = 300
 
 # Port of FTP and FTPS (1 to 65535, default 21).
 port = "21"
 
-# First port for passive transfers; 0 is the default range, 55536 to 55899 (0 to 65535, default 0).
+# First port for passive transfers; 0 means the default range, 55536 to 55899 (0 to 65535, default 0).
 passive_port_min = 0
 
-# Last port for passive transfers; 0 is the default range (0 to 65535, default 0).
+# Last port for passive transfers; 0 means the default range (0 to 65535, default 0).
 passive_port_max = 0
 
 # Passive mode announces the external address (0 or 1, default 0).
@@ -49,13 +49,13 @@ fips = 0
 # The limits maxuploadrate and maxdownloadrate are in force (0 or 1, default 0).
 enable_flow_ctrl = 0
 
-# Upload limit of a session; 0 is none (KB/s of 1024 bytes, 0 or more, default 0).
+# Upload limit of a session; 0 means no limit (KB/s of 1024 bytes, 0 or more, default 0).
 maxuploadrate = 0
 
-# Download limit of a session; 0 is none (KB/s of 1024 bytes, 0 or more, default 0).
+# Download limit of a session; 0 means no limit (KB/s of 1024 bytes, 0 or more, default 0).
 maxdownloadrate = 0
 
-# Connections from one client address; 0 is no limit (0 or more, default 0).
+# Connections from one client address; 0 means no limit (0 or more, default 0).
 max_conn_per_ip = 0
 
 # Kept unchanged for other programs (default 0).
@@ -82,7 +82,7 @@ constexpr const char* goldenSftp =
 # takes effect when the service starts next.
 version = 1
 
-# SFTP runs (0 or 1, default 0).
+# SFTP is enabled (0 or 1, default 0).
 enabled = 0
 
 # Port of SFTP (1 to 65535, default 22).

@@ -92,8 +92,8 @@ TEST(ShareFile, NamesTheFlawOfADamagedText) {
     EXPECT_EQ(flawIn("[]"), "expected an object");
     EXPECT_EQ(flawIn(R"({"shares":[]})"), "\"version\": expected 1");
     EXPECT_EQ(flawIn(R"({"version":2,"shares":[]})"), "\"version\": expected 1");
-    EXPECT_EQ(flawIn(R"({"version":1,"shares":{}})"), "\"shares\": expected an array");
-    EXPECT_EQ(flawIn(R"({"version":1})"), "\"shares\": expected an array");
+    EXPECT_EQ(flawIn(R"({"version":1,"shares":{}})"), "\"shares\": expected a list");
+    EXPECT_EQ(flawIn(R"({"version":1})"), "\"shares\": expected a list");
     EXPECT_EQ(flawIn(R"({"version":1,"shares":[],"more":1})"), "unknown key \"more\"");
 }
 

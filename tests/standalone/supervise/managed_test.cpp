@@ -101,12 +101,12 @@ TEST_F(ManagedSupervisor, StaysInTheForegroundAndSaysWhenTheDaemonServes) {
     EXPECT_EQ(heard(), "STATUS=the daemon serves");
     EXPECT_EQ(heard(), "READY=1");
     EXPECT_TRUE(accepts(port_));
-    EXPECT_EQ(readDaemonState(stateFile(directory_, "sftp"))->supervisor.pid, supervisor);
+    EXPECT_EQ(loadDaemonState(stateFile(directory_, "sftp"))->supervisor.pid, supervisor);
 
     const auto answer = askSupervisor(directory_, "sftp", {Command::pause, {}}, seconds(5));
     ASSERT_TRUE(answer);
     ASSERT_EQ(messageOf(*answer), "");
-    EXPECT_EQ(heard(), "STATUS=paused: only the sessions that were open go on");
+    EXPECT_EQ(heard(), "STATUS=paused: open sessions continue");
     ::kill(supervisor, SIGTERM);
     EXPECT_EQ(exitCodeOf(supervisor), 0);
     EXPECT_FALSE(std::filesystem::exists(stateFile(directory_, "sftp")));
@@ -134,7 +134,7 @@ TEST_F(ManagedSupervisor, AFailedStartIsItsLastWord) {
 
 TEST_F(ManagedSupervisor, WithoutAnOrderItSaysSo) {
     const pid_t supervisor = run();
-    EXPECT_EQ(heard(), "STATUS=nothing in " + directory_.string() + " says what to start");
+    EXPECT_EQ(heard(), "STATUS=" + directory_.string() + " has no valid order for sftp");
     EXPECT_EQ(exitCodeOf(supervisor), 1);
     ASSERT_TRUE(replaceFile(orderFile(directory_, "sftp"), encodeRequest({Command::stop, {}}), 0600));
     EXPECT_EQ(exitCodeOf(run()), 1) << "not an order to start";

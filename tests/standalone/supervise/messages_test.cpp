@@ -47,8 +47,8 @@ protected:
 TEST_F(StateFile, ComesBackAsItWasWritten) {
     const DaemonState state{RunState::failed,       {10, 100},   {11, 110}, "a hash", {21, 22},
                             {{12, 120}, {13, 130}}, "two\nlines"};
-    ASSERT_TRUE(writeDaemonState(file_, state));
-    const auto read = readDaemonState(file_);
+    ASSERT_TRUE(storeDaemonState(file_, state));
+    const auto read = loadDaemonState(file_);
     ASSERT_TRUE(read);
     EXPECT_EQ(read->state, state.state);
     EXPECT_EQ(read->supervisor, state.supervisor);
@@ -60,11 +60,11 @@ TEST_F(StateFile, ComesBackAsItWasWritten) {
 }
 
 TEST_F(StateFile, IsNotMadeOfAnotherText) {
-    EXPECT_FALSE(readDaemonState(file_));
+    EXPECT_FALSE(loadDaemonState(file_));
     std::ofstream(file_) << "state running\n";
-    EXPECT_FALSE(readDaemonState(file_));
+    EXPECT_FALSE(loadDaemonState(file_));
     std::ofstream(file_) << "velt-supervise 2\nboot " << bootId() << "\nstate dancing\ndaemon x y\nport\n";
-    const auto read = readDaemonState(file_);
+    const auto read = loadDaemonState(file_);
     ASSERT_TRUE(read);
     EXPECT_EQ(read->state, RunState::stopped);
     EXPECT_FALSE(read->daemon);
@@ -78,7 +78,7 @@ TEST_F(StateFile, OfAnotherBootIsNone) {
         std::ofstream(file_) << "velt-supervise 2\n"
                              << boot << "state running\ndaemon " << self->pid << ' ' << self->startTime
                              << '\n';
-        EXPECT_EQ(readDaemonState(file_).has_value(), boot == "boot " + bootId() + "\n") << boot;
+        EXPECT_EQ(loadDaemonState(file_).has_value(), boot == "boot " + bootId() + "\n") << boot;
     }
 }
 

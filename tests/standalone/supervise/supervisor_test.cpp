@@ -288,7 +288,7 @@ TEST_F(SupervisorTest, APidThatBelongsToAnotherProcessNowIsLeftAlone) {
     stale.daemon = {bystander, process->startTime + 1};
     stale.supervisor = stale.daemon;
     std::filesystem::create_directories(statePath("/run/velt"));
-    ASSERT_TRUE(writeDaemonState(stateFile(statePath("/run/velt"), "sftp"), stale));
+    ASSERT_TRUE(storeDaemonState(stateFile(statePath("/run/velt"), "sftp"), stale));
     EXPECT_FALSE(isServing(stale));
     EXPECT_EQ(messageOf(sftp_.stop()), "");
     EXPECT_TRUE(isAlive(*process));
@@ -303,8 +303,8 @@ TEST_F(SupervisorTest, ASecondSupervisorOfTheServiceIsRefused) {
     std::filesystem::remove(stateFile(statePath("/run/velt"), "sftp"));
     const DaemonOrder other = testOrder(freePort(), "two");
     const std::string refusal = messageOf(sftp_.start(other));
-    EXPECT_NE(refusal.find("another supervisor"), std::string::npos) << refusal;
-    ASSERT_TRUE(writeDaemonState(stateFile(statePath("/run/velt"), "sftp"), before));
+    EXPECT_NE(refusal.find("it already has a supervisor"), std::string::npos) << refusal;
+    ASSERT_TRUE(storeDaemonState(stateFile(statePath("/run/velt"), "sftp"), before));
     EXPECT_TRUE(isServing(before));
 }
 

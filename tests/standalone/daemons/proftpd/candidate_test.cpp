@@ -70,7 +70,7 @@ TEST_F(FtpCandidate, isRefusedForACertificateThatIsNone) {
 TEST_F(FtpCandidate, isRefusedBelowARootThatTheConfigurationCannotName) {
     setStateRoot(root_.path() / "100%u");
     const std::string refusal = messageOf(testFtpCandidate(plainSettings()));
-    EXPECT_NE(refusal.find("cannot hold"), std::string::npos) << refusal;
+    EXPECT_NE(refusal.find("its path may not contain"), std::string::npos) << refusal;
 }
 
 TEST_F(FtpCandidate, whatAKilledProcessLeftIsSweptAndWhatIsInUseStays) {

@@ -123,9 +123,9 @@ TEST_F(ServerCertificates, ofTheAdministratorAreNeverReplacedByOwnOnes) {
     root_.write("etc/velt/tls/server.crt", makeSelfSigned({"given", {}})->certificate);
     expectRefusal("server.key cannot be read");
     root_.write("etc/velt/tls/server.key", "nonsense");
-    expectRefusal("server.key does not contain a PEM private key");
+    expectRefusal("server.key does not contain an unencrypted PEM private key");
     root_.write("etc/velt/tls/server.key", makeSelfSigned({"other", {}})->key);
-    expectRefusal("server.key is not the key of the certificate");
+    expectRefusal("server.key does not match the certificate");
     root_.write("etc/velt/tls/server.crt", "nonsense");
     expectRefusal("server.crt does not contain a PEM certificate");
 }
@@ -136,7 +136,7 @@ TEST_F(ServerCertificates, withAKeyThatAsksForAPassphraseAreRefused) {
     const auto locked = runProcess({"openssl", "ec", "-aes128", "-passout", "pass:secret"}, pair->key);
     ASSERT_EQ(locked.exitCode, 0) << locked.errors;
     root_.write("etc/velt/tls/server.key", locked.output);
-    expectRefusal("without a passphrase");
+    expectRefusal("server.key does not contain an unencrypted PEM private key");
 }
 
 TEST_F(ServerCertificates, mayHaveAnRsaKey) {
@@ -154,7 +154,7 @@ TEST_F(ServerCertificates, mayHaveAnRsaKey) {
                           "-keyout", key, "-out", certificate})
                   .exitCode,
               0);
-    expectRefusal("neither RSA nor an elliptic-curve key");
+    expectRefusal("expected an RSA or elliptic-curve key");
 }
 
 } // namespace
