@@ -37,7 +37,7 @@ Json::Value ApiClient::exchange(const std::string& method, const std::string& pa
         return {};
     }
     if (answer.status != 200 && answer.status != 201) {
-        throw failureFrom(answer, server(), method == "GET");
+        throw failureFrom(answer, server(), {method, path});
     }
     const auto value = parseJson(answer.body);
     if (!value) {
@@ -91,7 +91,7 @@ void ApiClient::follow(const std::string& path, const std::function<bool(std::st
     const HttpAnswer answer = http_.follow(path, onText, stop);
     // The status is 0 when this was stopped before the server answered.
     if (answer.status != 200 && answer.status != 0) {
-        throw failureFrom(answer, server(), true);
+        throw failureFrom(answer, server(), {"GET", path});
     }
 }
 

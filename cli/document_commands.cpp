@@ -1,3 +1,4 @@
+#include "base/file.h"
 #include "base/json_value.h"
 #include "cli/command.h"
 #include "cli/failure.h"
@@ -6,11 +7,14 @@
 
 #include <CLI/CLI.hpp>
 
-#include <cerrno>
-#include <cstring>
+#include <unistd.h>
+
+#include <filesystem>
 #include <fstream>
 #include <memory>
 #include <ostream>
+#include <sstream>
+#include <system_error>
 
 namespace velt::cli {
 
@@ -21,18 +25,32 @@ struct DocumentOptions {
     bool dryRun = false;
 };
 
+/// Replaces a regular file, so that a full disk does not cost the former export; a link to it stays. Anything
+/// else, such as a pipe, is written to.
+Result<> writeExport(const std::string& name, const std::string& text) {
+    std::error_code error;
+    const std::filesystem::path former = std::filesystem::canonical(name, error);
+    const auto status = std::filesystem::status(former, error);
+    if (std::filesystem::is_regular_file(status) && ::access(former.c_str(), W_OK) == 0) {
+        return replaceFile(former, text, static_cast<mode_t>(status.permissions()));
+    }
+    std::ofstream file(name, std::ios::binary | std::ios::trunc);
+    file << text;
+    file.close();
+    return file ? Result<>() : cannot("write", name);
+}
+
 void exportTo(Context& context, const std::string& name) {
     const Json::Value document = exportSettings(context.api);
     if (name.empty()) {
         writeJson(context.console.out, document);
         return;
     }
-    std::ofstream file(name, std::ios::binary | std::ios::trunc);
-    writeJson(file, document);
-    file.close();
-    if (!file) {
-        throw Failure(ExitCode::local, "Cannot write " + name + ": " + std::strerror(errno) + ".",
-                      "Name a file in a folder that you may write to and that has space left.");
+    std::ostringstream text;
+    writeJson(text, document);
+    if (const auto written = writeExport(name, text.str()); !written) {
+        throw Failure(ExitCode::local, written.error().message,
+                      "Choose a file in a writable folder with free space.");
     }
 }
 

@@ -68,14 +68,20 @@ std::string failureHint(const Json::Value& problem, bool reads) {
                    : "Fix the problem that the server names, then try again.";
 }
 
-std::string hintOf(long status, const Json::Value& problem, const ServerAddress& server, bool reads) {
+std::string absenceHint(const std::string& path) {
+    return path.starts_with("/api/tokens/") ? "'veltctl tokens list' lists the tokens."
+                                            : "'veltctl call --list' lists the methods.";
+}
+
+std::string hintOf(long status, const Json::Value& problem, const ServerAddress& server,
+                   const AskedFor& asked) {
     switch (status) {
     case 401:
     case 403:
         return accessHint(status, server);
     case 404:
     case 405:
-        return "'veltctl call --list' lists the methods, 'veltctl tokens list' the tokens.";
+        return absenceHint(asked.path);
     case 408:
     case 429:
         return "Try again in a moment.";
@@ -85,7 +91,7 @@ std::string hintOf(long status, const Json::Value& problem, const ServerAddress&
         break;
     }
     if (status >= 500) {
-        return failureHint(problem, reads);
+        return failureHint(problem, asked.method == "GET");
     }
     return status >= 400 ? "Correct the input and try again." : checkAddress;
 }
@@ -116,7 +122,7 @@ void addNotes(Failure& failure, const Json::Value& problem) {
 
 } // namespace
 
-Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, bool reads) {
+Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, const AskedFor& asked) {
     Json::Value problem = parseJson(answer.body).valueOr({});
     if (!problem.isObject()) {
         problem = Json::Value(Json::objectValue);
@@ -130,7 +136,7 @@ Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, bool 
     Failure failure(meaning.code,
                     (titleTells ? title : meaning.message) + " (HTTP " + std::to_string(answer.status) +
                         (code.empty() ? "" : ", code " + code) + ").",
-                    hintOf(answer.status, problem, server, reads));
+                    hintOf(answer.status, problem, server, asked));
     if (!detail.empty()) {
         failure.note(detail);
     } else if (!titleTells && !title.empty()) {

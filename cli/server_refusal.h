@@ -5,11 +5,19 @@
 #include "cli/failure.h"
 #include "cli/http_client.h"
 
+#include <string>
+
 namespace velt::cli {
 
+/// The request that was refused. A GET could change nothing.
+struct AskedFor {
+    std::string method;
+    std::string path;
+};
+
 /// The failure that an answer other than 200, 201 or 204 stands for: the exit code by its status, what the
-/// problem document says, each fact once, and what to do next. `reads`: the request could change nothing.
-Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, bool reads);
+/// problem document says, each fact once, and what to do next.
+Failure failureFrom(const HttpAnswer& answer, const ServerAddress& server, const AskedFor& asked);
 
 /// The failure for an answer that a server of this release would not give; `message` says what is wrong with
 /// it.

@@ -60,10 +60,10 @@ std::optional<Role> roleNamed(const std::string& name) {
 }
 
 TokenStore::TokenStore(std::filesystem::path file) : file_(std::move(file)) {
-    read();
+    load();
 }
 
-void TokenStore::read() {
+void TokenStore::load() {
     std::error_code unknown;
     if (std::filesystem::symlink_status(file_, unknown).type() == std::filesystem::file_type::not_found) {
         return;

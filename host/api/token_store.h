@@ -59,7 +59,7 @@ public:
     std::optional<Token> find(const std::string& token) const;
 
 private:
-    void read();
+    void load();
     void store(const std::vector<Token>& tokens) const;
 
     const std::filesystem::path file_;

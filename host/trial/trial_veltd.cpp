@@ -11,11 +11,13 @@
 #include <poll.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/time.h>
 #include <sys/un.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <chrono>
 #include <csignal>
 #include <cstdio>
@@ -53,15 +55,24 @@ bool answers() {
     std::string_view(socketName).copy(static_cast<char*>(address.sun_path), sizeof address.sun_path - 1);
     const void* const name = &address;
     const UniqueFd socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
+    constexpr timeval longest{1, 0}; // for each step: a veltd that hangs accepts, or queues, and says nothing
+    ::setsockopt(socket.get(), SOL_SOCKET, SO_SNDTIMEO, &longest, sizeof longest);
+    ::setsockopt(socket.get(), SOL_SOCKET, SO_RCVTIMEO, &longest, sizeof longest);
     char first = 0;
     return ::connect(socket.get(), static_cast<const sockaddr*>(name), sizeof address) == 0 &&
            ::send(socket.get(), request.data(), request.size(), MSG_NOSIGNAL) > 0 &&
            ::recv(socket.get(), &first, 1, 0) == 1;
 }
 
-/// Waits until veltd answers. False when it ends before.
+/// Waits until veltd answers. False when it ends before. Throws TrialError when it does neither in time.
 bool waitForAnswer(const std::function<bool()>& runs) {
+    constexpr std::chrono::seconds longestStart(60);
+    const auto deadline = std::chrono::steady_clock::now() + longestStart;
     while (!answers()) {
+        if (std::chrono::steady_clock::now() > deadline) {
+            throw TrialError("veltd did not answer within " + std::to_string(longestStart.count()) +
+                             " s. See " + std::filesystem::absolute(logName).string() + ".");
+        }
         if (!runs()) {
             return false;
         }
@@ -165,7 +176,7 @@ bool waitForVeltd() {
 }
 
 void endVeltd() {
-    constexpr int longestEnd = 70'000;
+    constexpr int longestEnd = 70; // seconds
     const auto process = runningVeltd();
     const UniqueFd handle(process ? ::pidfd_open(*process, 0) : -1);
     // The handle is of this process, and not of a later one with the same number, if it still holds the lock.
@@ -173,8 +184,13 @@ void endVeltd() {
         return;
     }
     pollfd ended{handle.get(), POLLIN, 0};
-    if (::pidfd_send_signal(handle.get(), SIGTERM, nullptr, 0) != 0 || ::poll(&ended, 1, longestEnd) != 1) {
-        throw TrialError("veltd (process " + std::to_string(*process) + ") does not stop.");
+    const std::string number = std::to_string(*process);
+    if (::pidfd_send_signal(handle.get(), SIGTERM, nullptr, 0) != 0 && errno != ESRCH) {
+        throw TrialError(cannot("stop", "veltd (process " + number + ")"));
+    }
+    if (::poll(&ended, 1, longestEnd * 1000) != 1) {
+        throw TrialError("veltd (process " + number + ") did not stop within " + std::to_string(longestEnd) +
+                         " s. End it with kill -9 " + number + ", then try again.");
     }
 }
 
@@ -188,7 +204,7 @@ int chooseHttpPort(int former) {
         }
     }
     throw TrialError("Ports " + std::to_string(firstHttpPort) + " to " + std::to_string(lastHttpPort) +
-                     " of 127.0.0.1 are all taken.");
+                     " of 127.0.0.1 are all in use. Free one of them and start again.");
 }
 
 } // namespace velt::host

@@ -15,14 +15,14 @@ namespace velt {
 
 namespace {
 
-template<class Value> int readSetting(Value FtpSettings::*setting) {
+template<class Value> int loadSetting(Value FtpSettings::*setting) {
     return atBoundary([&]() -> Result<int> {
         VELT_ASSIGN_OR_RETURN(const FtpSettings settings, loadFtpFile());
         return static_cast<int>(settings.*setting);
     });
 }
 
-template<class Value> int writeSetting(Value FtpSettings::*setting, Value value) {
+template<class Value> int storeSetting(Value FtpSettings::*setting, Value value) {
     return atBoundary(
         [&] { return changeFtpSettings([&](FtpSettings& settings) { settings.*setting = value; }); });
 }
@@ -32,7 +32,7 @@ LastSeen<_tag_VELT_FTP_CONF_>& lastSeenRecord() {
     return seen;
 }
 
-Result<> readRecord(_tag_VELT_FTP_CONF_& record) {
+Result<> loadRecord(_tag_VELT_FTP_CONF_& record) {
     lastSeenRecord().forget();
     VELT_ASSIGN_OR_RETURN(const FtpSettings settings, loadFtpFile());
     record = settings.record;
@@ -146,7 +146,7 @@ Result<> writeRule(char* buffer, int size, bool isUser, int id, const char* path
 int VELTFTPConfGet(_tag_VELT_FTP_CONF_* out) {
     if (out == nullptr)
         return velt::missing("A record for the FTP settings");
-    return velt::atBoundary([out] { return velt::readRecord(*out); });
+    return velt::atBoundary([out] { return velt::loadRecord(*out); });
 }
 
 int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf) {
@@ -154,43 +154,43 @@ int VELTFTPConfSet(_tag_VELT_FTP_CONF_ conf) {
 }
 
 int VELTFTPTimeOutGet(void) {
-    return velt::readSetting(&velt::FtpSettings::timeout);
+    return velt::loadSetting(&velt::FtpSettings::timeout);
 }
 
 int VELTFTPTimeOutSet(int timeout) {
-    return velt::writeSetting(&velt::FtpSettings::timeout, timeout);
+    return velt::storeSetting(&velt::FtpSettings::timeout, timeout);
 }
 
 int VELTFTPUseUTF8Get(void) {
-    return velt::readSetting(&velt::FtpSettings::useUtf8);
+    return velt::loadSetting(&velt::FtpSettings::useUtf8);
 }
 
 int VELTFTPUseUTF8Set(int enable) {
-    return velt::writeSetting(&velt::FtpSettings::useUtf8, enable != 0);
+    return velt::storeSetting(&velt::FtpSettings::useUtf8, enable != 0);
 }
 
 int VELTFTPFIPSEnabledGet(void) {
-    return velt::readSetting(&velt::FtpSettings::fipsOnly);
+    return velt::loadSetting(&velt::FtpSettings::fipsOnly);
 }
 
 int VELTFTPFIPSEnabledSet(int enable) {
-    return velt::writeSetting(&velt::FtpSettings::fipsOnly, enable != 0);
+    return velt::storeSetting(&velt::FtpSettings::fipsOnly, enable != 0);
 }
 
 int VELTFTPASCIIEnabledGet(void) {
-    return velt::readSetting(&velt::FtpSettings::ascii);
+    return velt::loadSetting(&velt::FtpSettings::ascii);
 }
 
 int VELTFTPASCIIEnabledSet(int enable) {
-    return velt::writeSetting(&velt::FtpSettings::ascii, enable != 0);
+    return velt::storeSetting(&velt::FtpSettings::ascii, enable != 0);
 }
 
 int VELTFTPUmaskEnabledGet(void) {
-    return velt::readSetting(&velt::FtpSettings::umask);
+    return velt::loadSetting(&velt::FtpSettings::umask);
 }
 
 int VELTFTPUmaskEnabledSet(bool enable) {
-    return velt::writeSetting(&velt::FtpSettings::umask, enable);
+    return velt::storeSetting(&velt::FtpSettings::umask, enable);
 }
 
 int VELTFTPDefaultPassivePortGet(VELT_FTP_PORT_RANGE* out) {

@@ -1,6 +1,7 @@
 #include "standalone/rules/rule_store.h"
 
 #include "base/file.h"
+#include "base/text.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
@@ -17,8 +18,8 @@ std::filesystem::path rulesFile() {
 }
 
 Error damaged(int lineNumber, const std::string& why) {
-    return {ErrorNumber::damaged,
-            rulesFile().string() + ", line " + std::to_string(lineNumber) + ": " + why + "."};
+    return {ErrorNumber::damaged, "Cannot read " + rulesFile().string() + ", line " +
+                                      std::to_string(lineNumber) + ": " + why + "."};
 }
 
 } // namespace
@@ -26,12 +27,10 @@ Error damaged(int lineNumber, const std::string& why) {
 Result<std::vector<ChrootRule>> parseRules(std::string_view text) {
     std::vector<ChrootRule> rules;
     for (int number = 1; number == 1 || !text.empty(); number++) {
-        const auto end = text.find('\n');
-        if (end == std::string_view::npos) {
+        if (!text.empty() && text.find('\n') == std::string_view::npos) {
             return damaged(number, "the line is cut off");
         }
-        const auto line = text.substr(0, end);
-        text.remove_prefix(end + 1);
+        const auto line = cut(text, '\n');
         if (number == 1) {
             if (line != versionLine) {
                 return damaged(number, "expected \"" + std::string(versionLine) + "\"");

@@ -1,5 +1,12 @@
 #include "tests/cli/cli_test.h"
 
+#include <sys/resource.h>
+#include <sys/stat.h>
+
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+
 namespace {
 
 class DocumentTest : public CliTest {
@@ -28,6 +35,32 @@ TEST_F(DocumentTest, AnExportGoesIntoAFile) {
     EXPECT_EQ(result.out, "");
     EXPECT_EQ(jsonOf(contentOf(folder.path("settings.json"))), exported());
     EXPECT_EQ(run({"export", "--output", folder.path("absent/settings.json")}).code, 1);
+    EXPECT_EQ(run({"export", "--output", "/dev/full"}).code, 1);
+}
+
+TEST_F(DocumentTest, AnExportThatCannotBeWrittenKeepsTheFormerOne) {
+    const std::string file = folder.path("settings.json");
+    const std::string link = folder.path("link.json");
+    std::filesystem::create_symlink(file, link);
+    std::ofstream(file) << "the former export";
+    ASSERT_EQ(::chmod(file.c_str(), 0640), 0);
+    // As on a full disk: no file may grow.
+    rlimit former{};
+    ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &former), 0);
+    const rlimit none{0, former.rlim_max};
+    const auto handler = std::signal(SIGXFSZ, SIG_IGN);
+    ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &none), 0);
+    const RunResult result = run({"export", "--output", link});
+    ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &former), 0);
+    std::signal(SIGXFSZ, handler);
+    EXPECT_EQ(result.code, 1);
+    EXPECT_NE(result.err.find("with free space"), std::string::npos) << result.err;
+    EXPECT_EQ(contentOf(file), "the former export");
+
+    EXPECT_EQ(run({"export", "--output", link}).code, 0);
+    EXPECT_EQ(jsonOf(contentOf(file)), exported());
+    EXPECT_TRUE(std::filesystem::is_symlink(link));
+    EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0640));
 }
 
 TEST_F(DocumentTest, WhatWasExportedChangesNothing) {

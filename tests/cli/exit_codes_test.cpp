@@ -53,6 +53,8 @@ TEST_F(ExitCodesTest, RefusedInput) {
     EXPECT_EQ(codeAfter(422), 3);
     EXPECT_EQ(codeAfter(400), 3);
     EXPECT_EQ(codeAfter(404), 3);
+    EXPECT_NE(last.err.find("'veltctl call --list' lists"), std::string::npos) << last.err;
+    EXPECT_EQ(last.err.find("token"), std::string::npos) << last.err;
     EXPECT_EQ(codeAfter(405), 3);
     EXPECT_EQ(codeAfter(413), 3);
 }

@@ -33,4 +33,6 @@ TEST_F(TokensTest, ATokenIsMadeInvalid) {
     const RunResult result = run({"tokens", "delete", "t9"});
     EXPECT_EQ(result.code, 3);
     EXPECT_NE(result.err.find("No such token"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("'veltctl tokens list' lists"), std::string::npos) << result.err;
+    EXPECT_EQ(result.err.find("methods"), std::string::npos) << result.err;
 }

@@ -3,11 +3,13 @@
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/text.h"
 
 namespace {
 
 using velt::host::LoadError;
 using velt::host::ModuleTable;
+using velt::test::contains;
 
 /// Why the files cannot be loaded together; "" when they can.
 std::string reason(const std::vector<std::string>& files) {
@@ -20,10 +22,6 @@ std::string reason(const std::vector<std::string>& files) {
     } catch (const LoadError& error) {
         return error.what();
     }
-}
-
-bool contains(const std::string& text, const std::string& part) {
-    return text.find(part) != std::string::npos;
 }
 
 TEST(Modules, SeveralAreLoaded) {

@@ -58,7 +58,7 @@ TEST_F(RuleStore, isNotMadeAnewWhereItsFileCannotBeReached) {
 
 TEST_F(RuleStore, namesTheLineThatIsDamaged) {
     const std::pair<const char*, const char*> cases[] = {
-        {"", "line 1: the line is cut off."},
+        {"", "line 1: expected \"velt-chroot-rules 1\"."},
         {"velt-chroot-rules 2\n", "line 1: expected \"velt-chroot-rules 1\"."},
         {"velt-chroot-rules 1", "line 1: the line is cut off."},
         {"velt-chroot-rules 1\nu:1:/home\nnonsense\n",
@@ -70,7 +70,8 @@ TEST_F(RuleStore, namesTheLineThatIsDamaged) {
     for (const auto& [text, sentence] : cases) {
         root_.write("etc/velt/chroot_rules", text);
         const std::string why = messageOf(loadRules());
-        EXPECT_EQ(why, (root_.path() / "etc/velt/chroot_rules").string() + ", " + sentence) << text;
+        EXPECT_EQ(why, "Cannot read " + (root_.path() / "etc/velt/chroot_rules").string() + ", " + sentence)
+            << text;
     }
 }
 
