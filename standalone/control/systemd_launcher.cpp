@@ -13,10 +13,13 @@
 namespace velt {
 namespace {
 
+bool succeeded(const Result<ProcessResult>& asked) {
+    return asked && asked->exitCode == 0;
+}
+
 /// systemctl's own reason, where it has one.
-Error reasonOf(const ProcessResult& failed) {
-    const std::string words = lastWords(failed.errors);
-    return Error(words.empty() ? "systemctl ended with status " + std::to_string(failed.exitCode) : words);
+Error reasonOf(const Result<ProcessResult>& failed) {
+    return Error(reasonOfEnd(failed, "systemctl"));
 }
 
 } // namespace
@@ -29,15 +32,18 @@ Result<> SystemdLauncher::launch(const std::filesystem::path& folder, const Daem
     VELT_RETURN_IF_ERROR(writeUnits(folder));
     // Not "start": after a killed supervisor systemd may be waiting to start it again, and a daemon of the
     // former settings with it.
-    const ProcessResult started = runProcess({places_.systemctl, "restart", unit_}, {}, startLimit);
-    if (started.exitCode == 0) {
+    const auto started = runProcess({places_.systemctl, "restart", unit_}, {}, startLimit);
+    if (!started) {
+        return reasonOf(started);
+    }
+    if (succeeded(started)) {
         const auto now = loadDaemonState(stateFile(folder, daemon_.name));
         return now && isServing(*now) ? Result<>()
                                       : Error("systemd reports a start, but the daemon does not serve");
     }
     const std::string reason =
-        started.exitCode < 0 ? "its supervisor did not report in time" : reasonOfFailure();
-    runProcess({places_.systemctl, "stop", "--no-block", unit_});
+        started->ranTooLong ? "its supervisor did not report in time" : reasonOfFailure();
+    (void)runProcess({places_.systemctl, "stop", "--no-block", unit_});
     return reason.empty() ? reasonOf(started) : Error(reason);
 }
 
@@ -60,25 +66,24 @@ Result<> SystemdLauncher::writeUnits(const std::filesystem::path& folder) const 
     if (!written) {
         return {};
     }
-    const ProcessResult reloaded = runProcess({places_.systemctl, "daemon-reload"});
-    return reloaded.exitCode == 0 ? Result<>() : reasonOf(reloaded);
+    const auto reloaded = runProcess({places_.systemctl, "daemon-reload"});
+    return succeeded(reloaded) ? Result<>() : reasonOf(reloaded);
 }
 
 /// What the supervisor said last.
 std::string SystemdLauncher::reasonOfFailure() const {
-    const ProcessResult shown =
-        runProcess({places_.systemctl, "show", "--value", "--property=StatusText", unit_});
-    return std::string(trimmedEnd(shown.output, "\n"));
+    const auto shown = runProcess({places_.systemctl, "show", "--value", "--property=StatusText", unit_});
+    return shown ? std::string(trimmedEnd(shown->output, "\n")) : "";
 }
 
 Result<> SystemdLauncher::retire() {
     if (!fileExists(places_.units / unit_)) {
         return {};
     }
-    const ProcessResult stopped = runProcess({places_.systemctl, "stop", unit_});
+    const auto stopped = runProcess({places_.systemctl, "stop", unit_});
     // Until somebody switches it off, a daemon that did not start is a failure of the machine.
-    runProcess({places_.systemctl, "reset-failed", unit_});
-    return stopped.exitCode == 0 ? Result<>() : reasonOf(stopped);
+    (void)runProcess({places_.systemctl, "reset-failed", unit_});
+    return succeeded(stopped) ? Result<>() : reasonOf(stopped);
 }
 
 } // namespace velt

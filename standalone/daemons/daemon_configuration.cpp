@@ -32,14 +32,11 @@ Result<> checkRenderable(const std::filesystem::path& path, const std::filesyste
 
 Result<> runConfigurationTest(const std::string& label, const std::vector<std::string>& arguments) {
     const auto result = runProcess(arguments);
-    if (result.exitCode == 0) {
+    if (result && result->exitCode == 0) {
         return {};
     }
-    std::string words = lastWords(result.errors);
-    if (words.empty()) {
-        words = "it ended with status " + std::to_string(result.exitCode);
-    }
-    return Error(ErrorNumber::daemon, "The " + label + " daemon refuses its configuration: " + words + ".");
+    return Error(ErrorNumber::daemon,
+                 "The " + label + " daemon refuses its configuration: " + reasonOfEnd(result) + ".");
 }
 
 } // namespace velt

@@ -11,6 +11,7 @@
 #include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/ruleset.h"
 #include "standalone/firewall/ruleset_generation.h"
+#include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 
 #include <syslog.h>
@@ -33,11 +34,13 @@ std::string firstLine(const std::string& text) {
 }
 
 Result<> load(const std::string& script) {
-    const ProcessResult result = runProcess({"nft", "-f", "-"}, script);
-    if (result.exitCode == 0) {
+    const auto result = runProcess({"nft", "-f", "-"}, script);
+    if (result && result->exitCode == 0) {
         return {};
     }
-    std::string reason(trimmedEnd(firstLine(result.errors), ". ")); // it may be a sentence of its own
+    const std::string errors = result ? result->errors : result.error().message;
+    std::string reason(trimmedEnd(firstLine(errors), ". ")); // it may be a sentence of its own
+    reason = reasonOfEnd(reason, result ? result->exitCode : 0);
     if (reason.find("Operation not permitted") != std::string::npos) {
         reason = "this process is not allowed to change the firewall";
     }
@@ -45,8 +48,8 @@ Result<> load(const std::string& script) {
 }
 
 void warnOfForeignTables() {
-    const std::vector<std::string> chains =
-        foreignDropChains(runProcess({"nft", "--json", "list", "chains"}).output);
+    const auto listed = runProcess({"nft", "--json", "list", "chains"});
+    const std::vector<std::string> chains = foreignDropChains(listed ? listed->output : "");
     if (chains.empty()) {
         ::unlink(warningFile().c_str());
         return;

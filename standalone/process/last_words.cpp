@@ -47,4 +47,13 @@ std::string lastWords(const std::string& errors) {
     return std::string(trimmedEnd(withoutPrefix(std::move(words)), "\r ."));
 }
 
+std::string reasonOfEnd(std::string words, int status, const std::string& program) {
+    return words.empty() ? program + " ended with status " + std::to_string(status) : std::move(words);
+}
+
+std::string reasonOfEnd(const Result<ProcessResult>& failed, const std::string& program) {
+    return failed ? reasonOfEnd(lastWords(failed->errors), failed->exitCode, program)
+                  : lastWords(failed.error().message);
+}
+
 } // namespace velt

@@ -97,44 +97,39 @@ int collect(pid_t pid) {
     return info.si_code == CLD_EXITED ? info.si_status : 128 + info.si_status;
 }
 
-ProcessResult notStarted(const Error& why) {
-    ProcessResult result;
-    result.errors = why.message;
-    return result;
-}
-
 } // namespace
 
-ProcessResult runProcess(std::vector<std::string> arguments, std::string_view input,
-                         std::chrono::milliseconds limit) {
+Result<ProcessResult> runProcess(std::vector<std::string> arguments, std::string_view input,
+                                 std::chrono::milliseconds limit) {
     if (arguments.empty())
-        return notStarted(cannot("start", "a program without a name", EINVAL));
+        return cannot("start", "a program without a name", EINVAL);
     const auto deadline = Clock::now() + limit;
     const std::string program = findProgram(arguments[0]);
     if (program.empty())
-        return notStarted(cannot("start", arguments[0], ENOENT));
+        return cannot("start", arguments[0], ENOENT);
     arguments[0] = program;
     const UniqueFd in = makeInput(input);
     auto out = makePipe();
     auto err = makePipe();
     if (!in || !out || !err)
-        return notStarted(cannot("start", program));
-    const auto pid = spawn(arguments, {in.get(), out->writeEnd.get(), err->writeEnd.get()});
-    if (!pid)
-        return notStarted(pid.error());
+        return cannot("start", program);
+    VELT_ASSIGN_OR_RETURN(const pid_t pid,
+                          spawn(arguments, {in.get(), out->writeEnd.get(), err->writeEnd.get()}));
     out->writeEnd.reset();
     err->writeEnd.reset();
-    const UniqueFd process(::pidfd_open(*pid, 0));
+    const UniqueFd process(::pidfd_open(pid, 0));
     ProcessResult result;
-    if (process && readUntilEnd(process.get(), out->readEnd, err->readEnd, deadline, result)) {
-        result.exitCode = collect(*pid);
-        return result;
+    const bool ended = process && readUntilEnd(process.get(), out->readEnd, err->readEnd, deadline, result);
+    if (!ended)
+        ::kill(pid, SIGKILL);
+    result.exitCode = collect(pid);
+    if (!process)
+        return Error(program + " cannot be watched and was ended.");
+    if (!ended) {
+        result.ranTooLong = true;
+        result.errors +=
+            program + " ran for more than " + std::to_string(limit.count()) + " ms and was ended.";
     }
-    ::kill(*pid, SIGKILL);
-    collect(*pid);
-    result.errors +=
-        program + (process ? " ran for more than " + std::to_string(limit.count()) + " ms and was ended."
-                           : std::string(" cannot be watched and was ended."));
     return result;
 }
 

@@ -88,8 +88,7 @@ Error DaemonProcess::ended(int waitStatus) {
     if (WIFSIGNALED(waitStatus)) { // its output does not explain a signal
         return Error("it was ended by signal " + std::to_string(WTERMSIG(waitStatus)));
     }
-    return Error(words.empty() ? "it ended with status " + std::to_string(WEXITSTATUS(waitStatus))
-                               : std::move(words));
+    return Error(reasonOfEnd(std::move(words), WEXITSTATUS(waitStatus)));
 }
 
 std::string DaemonProcess::takeLastWords() {

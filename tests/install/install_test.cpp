@@ -1,5 +1,5 @@
 // An installation below a prefix of its own: what is there, and that it works there.
-#include "standalone/process/run_program.h"
+#include "tests/support/run_program.h"
 #include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>

@@ -1,6 +1,6 @@
 // An installation at work: its parts find each other without being told where they are.
-#include "standalone/process/run_program.h"
 #include "tests/support/files.h"
+#include "tests/support/run_program.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/leftovers.h"
 #include "tests/system/support/private_world.h"

@@ -4,11 +4,11 @@
 #include "platform/sftp.h"
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
-#include "standalone/process/run_program.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/support/daemon_states.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"
+#include "tests/support/run_program.h"
 #include "tests/system/support/ftp_service.h"
 #include "tests/system/support/private_world.h"
 

@@ -1,6 +1,6 @@
 // The quick start and the README's tour, as somebody does them who reads the page and copies its commands.
-#include "standalone/process/run_program.h"
 #include "tests/support/files.h"
+#include "tests/support/run_program.h"
 #include "tests/support/text.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/leftovers.h"

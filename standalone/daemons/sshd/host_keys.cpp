@@ -34,9 +34,8 @@ Result<> makeKey(const std::string& kind, const std::filesystem::path& place) {
     const auto result =
         runProcess({"/usr/bin/ssh-keygen", "-q", "-t", kind, "-N", "", "-C", "", "-f", made.string()}, {},
                    std::chrono::seconds(60));
-    if (result.exitCode != 0) {
-        return Error(ErrorNumber::daemon,
-                     "Cannot make a host key for SFTP: " + lastWords(result.errors) + ".");
+    if (!result || result->exitCode != 0) {
+        return Error(ErrorNumber::daemon, "Cannot make a host key for SFTP: " + reasonOfEnd(result) + ".");
     }
     VELT_RETURN_IF_ERROR(storeCopy(made.string() + ".pub", place.string() + ".pub", 0644));
     return storeCopy(made, place, 0600);

@@ -8,10 +8,10 @@
 #include "standalone/control/systemd_unit.h"
 #include "standalone/core/installed_files.h"
 #include "standalone/core/state_root.h"
-#include "standalone/process/run_program.h"
 #include "tests/standalone/supervise/daemon_test.h"
 #include "tests/support/ports.h"
 #include "tests/support/result.h"
+#include "tests/support/run_program.h"
 #include "tests/support/waiting.h"
 
 #include <csignal>
@@ -186,6 +186,16 @@ TEST_F(SystemdTest, SystemdsOwnRefusalIsNamed) {
     std::filesystem::remove(places_.units / "velt-sftp.service");
     refusal = messageOf(sftp_->start(testOrder(port_, "one")));
     EXPECT_EQ(refusal, "The SFTP daemon does not start: systemctl ended with status 3.");
+}
+
+TEST_F(SystemdTest, ASystemctlThatCannotBeRunIsNamed) {
+    start("one");
+    ASSERT_EQ(messageOf(sftp_->stop()), "");
+    std::filesystem::remove(places_.systemctl);
+    const std::string refusal = messageOf(sftp_->start(testOrder(port_, "one")));
+    EXPECT_EQ(refusal, "The SFTP daemon does not start: Cannot start " + places_.systemctl +
+                           ": No such file or directory.");
+    answerWith(systemctlScript());
 }
 
 TEST_F(SystemdTest, AnAnswerIsNotTakenForADaemon) {

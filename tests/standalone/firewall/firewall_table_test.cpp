@@ -10,10 +10,10 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
-#include "standalone/process/run_program.h"
 #include "tests/standalone/control/plan_double.h"
 #include "tests/standalone/firewall/private_network.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/support/run_program.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 #include "tests/standalone/firewall/private_network.h"
 
-#include "standalone/process/run_program.h"
+#include "tests/support/run_program.h"
 
 #include <arpa/inet.h>
 #include <fcntl.h>

@@ -5,7 +5,7 @@
 #define VELT_TESTS_SYSTEM_SUPPORT_CLIENTS_H
 
 #include "base/unique_fd.h"
-#include "standalone/process/run_program.h"
+#include "tests/support/run_program.h"
 #include "tests/system/support/ftp_session.h"
 
 #include <string>

@@ -3,8 +3,8 @@
 #define VELT_TESTS_SYSTEM_SUPPORT_FTP_SERVICE_H
 
 #include "ftp/ftp_library.h"
-#include "standalone/process/run_program.h"
 #include "standalone/shares/share_store.h"
+#include "tests/support/run_program.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/files.h"
 #include "tests/system/support/ftp_session.h"

@@ -2,8 +2,8 @@
 #ifndef VELT_TESTS_SYSTEM_SUPPORT_SYSTEMD_SERVICES_H
 #define VELT_TESTS_SYSTEM_SUPPORT_SYSTEMD_SERVICES_H
 
-#include "standalone/process/run_program.h"
 #include "tests/standalone/support/daemon_states.h"
+#include "tests/support/run_program.h"
 #include "tests/system/support/systemd_world.h"
 
 #include <gtest/gtest.h>

@@ -1,7 +1,7 @@
 #include "tests/system/support/systemd_world.h"
 
 #include "base/unique_fd.h"
-#include "standalone/process/run_program.h"
+#include "tests/support/run_program.h"
 #include "tests/support/waiting.h"
 #include "tests/system/support/systemd_root.h"
 

@@ -3,8 +3,8 @@
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/daemons/tls/self_signed.h"
-#include "standalone/process/run_program.h"
 #include "tests/support/result.h"
+#include "tests/support/run_program.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/support/text.h"
 
