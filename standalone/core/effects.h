@@ -22,7 +22,7 @@ enum class Effect {
     logEntry,
 };
 
-/// The effect's name: "store", "firewall", "stop", "start", "run key", "event", "log".
+/// The effect's name, for tests: "store", "firewall", "stop", "start", "run key", "event", "log".
 std::string_view effectName(Effect effect);
 
 /// Does the effect by calling `act` and returns its outcome. `subject` says what it concerns ("ftp settings",
@@ -34,7 +34,8 @@ Result<> perform(Effect effect, std::string_view subject, const std::function<Re
 using EffectDecision = std::optional<Result<>>;
 using EffectHook = std::function<EffectDecision(Effect effect, std::string_view subject)>;
 
-/// Sets the calling thread's hook in place of its former one; an empty function removes it.
+/// Sets the calling thread's hook in place of its former one; an empty function removes it. For tests, which
+/// list effects, leave them undone or fail them; the product sets none.
 void setEffectHook(EffectHook hook);
 
 /// Told of each effect that was done, or tried, with its outcome (an error, too, when it threw) and what it
