@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <span>
+#include <string_view>
 
 namespace velt::schema {
 
@@ -14,9 +15,25 @@ enum class SettingType {
     text,
 };
 
-inline constexpr std::int64_t highestPort = 65535;
+inline constexpr int highestPort = 65535;
+inline constexpr int firstPassivePort = 55536; ///< of the default range
+inline constexpr int lastPassivePort = 55899;
+inline constexpr const char* passiveRange = "55536:55899"; ///< the same, as a text
 inline constexpr std::int64_t highestNumber = INT32_MAX;
 inline constexpr std::int64_t lowestNumber = INT32_MIN;
+
+constexpr bool isRange(std::string_view text, int first, int last) {
+    int ends[2] = {};
+    std::size_t end = 0;
+    for (const char c : text) {
+        if (c == ':')
+            ++end;
+        else
+            ends[end] = ends[end] * 10 + (c - '0');
+    }
+    return ends[0] == first && ends[1] == last;
+}
+static_assert(isRange(passiveRange, firstPassivePort, lastPassivePort));
 
 /// What becomes of a number outside a setting's range.
 enum class OutOfRange {
@@ -77,11 +94,11 @@ inline constexpr Setting ftpSettings[] = {
     {.key = "custom_port",
      .type = SettingType::text,
      .meaning = "Ports for passive transfers",
-     .text = "55536:55899",
+     .text = passiveRange,
      .form = "first and last port, such as 55536:55899"},
     {.fileKey = "passive_port_min",
      .type = SettingType::number,
-     .meaning = "First port for passive transfers; 0 means the default range, 55536 to 55899",
+     .meaning = "First port for passive transfers; 0 means the default range",
      .most = highestPort,
      .outOfRange = OutOfRange::accepted},
     {.fileKey = "passive_port_max",

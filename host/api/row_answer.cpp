@@ -22,9 +22,8 @@ struct Meaning {
 constexpr int badParameter = 1901;
 constexpr Meaning otherFailure{0, 500, "The operation failed", false};
 
-constexpr std::array<Meaning, 6> meanings{{
+constexpr std::array<Meaning, 5> meanings{{
     {badParameter, 422, "A parameter is invalid", false},
-    {1902, 500, "The operation failed", false},
     {1903, 409, "The FTP port is taken", true},
     {1904, 409, "The passive port range is taken", true},
     {1905, 409, "The share cannot be reached over FTP", false},

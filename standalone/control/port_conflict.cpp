@@ -1,5 +1,6 @@
 #include "standalone/control/port_conflict.h"
 
+#include "schema/settings_table.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/ports/known_services.h"
 #include "standalone/ports/port_range.h"
@@ -13,8 +14,6 @@
 
 namespace velt {
 namespace {
-
-constexpr int highestPort = 65535;
 
 struct Question {
     std::string_view service;
@@ -58,10 +57,10 @@ Result<std::vector<Claim>> loadClaims() {
 std::optional<PortConflict> conflictOfForm(const Question& question) {
     const VELT_FTP_PORT_RANGE& range = question.range;
     for (const int port : {range.first, range.last}) {
-        if (port < 1 || port > highestPort) {
+        if (port < 1 || port > schema::highestPort) {
             return PortConflict{port, "",
                                 "Port " + std::to_string(port) + ": expected a port from 1 to " +
-                                    std::to_string(highestPort) + "."};
+                                    std::to_string(schema::highestPort) + "."};
         }
     }
     if (range.first > range.last) {

@@ -1,13 +1,15 @@
 #include "standalone/ports/port_range.h"
 
 #include "base/number_text.h"
+#include "schema/settings_table.h"
 
 namespace velt {
 namespace {
 
 std::optional<int> parsePort(std::string_view text) {
     const auto port = parseNumber(text);
-    return port && *port >= 1 && *port <= 65535 ? std::optional(static_cast<int>(*port)) : std::nullopt;
+    return port && *port >= 1 && *port <= schema::highestPort ? std::optional(static_cast<int>(*port))
+                                                              : std::nullopt;
 }
 
 } // namespace

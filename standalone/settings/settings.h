@@ -4,6 +4,7 @@
 
 #include "base/result.h"
 #include "ftp/ftp_library.h"
+#include "schema/settings_table.h"
 
 #include <string>
 
@@ -33,7 +34,7 @@ struct NetworkSettings {
 };
 
 /// The passive range in force without a custom one.
-inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{55536, 55899};
+inline constexpr VELT_FTP_PORT_RANGE defaultPassiveRange{schema::firstPassivePort, schema::lastPassivePort};
 
 /// What is in force before the first store.
 FtpSettings defaultFtpSettings();

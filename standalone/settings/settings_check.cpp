@@ -70,8 +70,8 @@ Result<> checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
     const VELT_FTP_PORT_RANGE range = passiveRange(record);
     if (range.first < lowestPassivePort || range.first > schema::highestPort ||
         range.last < lowestPassivePort || range.last > schema::highestPort)
-        return refuse("The passive port range is " + rangeText(range) +
-                      "; expected ports from 1024 to 65535.");
+        return refuse("The passive port range is " + rangeText(range) + "; expected ports from " +
+                      std::to_string(lowestPassivePort) + " to " + std::to_string(schema::highestPort) + ".");
     if (range.first > range.last)
         return refuse("The passive port range is " + rangeText(range) +
                       "; its first port has to be lower than its last.");

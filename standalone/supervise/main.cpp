@@ -12,6 +12,7 @@
 
 #include "base/number_text.h"
 #include "base/text.h"
+#include "schema/settings_table.h"
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/service_manager.h"
 #include "standalone/supervise/supervisor.h"
@@ -45,7 +46,7 @@ std::optional<std::vector<int>> parsePorts(std::string_view text) {
     std::vector<int> ports;
     while (!text.empty()) {
         const auto port = velt::parseNumber(velt::cut(text, ','));
-        if (!port || *port < 1 || *port > 65535) {
+        if (!port || *port < 1 || *port > velt::schema::highestPort) {
             return std::nullopt;
         }
         ports.push_back(static_cast<int>(*port));

@@ -22,7 +22,7 @@ timeout = 300
 # Port of FTP and FTPS (1 to 65535, default 21).
 port = "21"
 
-# First port for passive transfers; 0 means the default range, 55536 to 55899 (0 to 65535, default 0).
+# First port for passive transfers; 0 means the default range (0 to 65535, default 0).
 passive_port_min = 0
 
 # Last port for passive transfers; 0 means the default range (0 to 65535, default 0).
