@@ -62,7 +62,7 @@ TEST_F(HostLimits, ABodyMayBeAsLargeAsTheLimit) {
 
 TEST_F(HostLimits, OnlyTheListsOfAdminsAreLarge) {
     start();
-    constexpr std::size_t most = 64 * 1024;
+    constexpr std::size_t most = std::size_t{64} * 1024;
     const std::string json = R"({"enable":true})";
     const std::string usual = json + std::string(most - json.size(), ' ');
     EXPECT_EQ(post(target + "set", usual).status, 204);
