@@ -8,7 +8,7 @@ namespace velt::host {
 
 namespace {
 
-// Listening sockets, connections that get a 503 and those kept for root, files of the modules and the
+// Listening sockets, connections that get a 503 and those of root, files of the modules and the
 // platform.
 constexpr std::size_t others = 256;
 

@@ -27,8 +27,6 @@ using Acceptor = asio::basic_socket_acceptor<asio::generic::stream_protocol, Exe
 constexpr std::chrono::milliseconds acceptPause{50};
 /// How many connections beyond the limit get a 503.
 constexpr std::size_t refusedConnections = 64;
-/// How many more are kept for root and the host's own user, so that nobody can lock them out.
-constexpr std::size_t ownConnections = 16;
 
 std::unique_ptr<asio::ssl::context> makeTlsContext(const TlsFiles& files) {
     if (files.certificate.empty()) {
@@ -98,10 +96,8 @@ struct HttpServer::Core {
             setsockopt(socket.native_handle(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
         }
         const std::size_t open = connections.count();
-        const std::size_t limit =
-            limits.connections + (isOwn(peer) ? refusedConnections + ownConnections : 0);
-        // Idle connections must not keep out clients that have a request.
-        if (open >= limit && !connections.makeRoom()) {
+        // Idle connections must not keep out clients that have a request, and none may keep out root.
+        if (!isOwn(peer) && open >= limits.connections && !connections.makeRoom()) {
             if (!isTls && open < limits.connections + refusedConnections) {
                 make<PlainStream>(std::move(socket), std::move(peer))->refuse();
             }

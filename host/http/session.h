@@ -54,7 +54,11 @@ class Session final : public Connection, public std::enable_shared_from_this<Ses
 public:
     Session(SessionShared& shared, Stream stream, Peer peer)
         : shared_(shared), stream_(std::move(stream)), timer_(shared.context), peer_(std::move(peer)),
-          handler_(shared.handler), limits_(shared.limits), reader_(limits_.head, limits_.body) {}
+          handler_(shared.handler), limits_(shared.limits), reader_(limits_.head, limits_.body) {
+        if (isOwn(peer_)) {
+            trust();
+        }
+    }
 
     /// Serves requests until either side ends the connection.
     void start() {
