@@ -26,7 +26,7 @@ std::vector<SettingGroup> groupsInOrder() {
     for (const schema::SettingGroup* table : schema::groups) {
         groups.push_back(newestGroupOf(*table));
     }
-    std::ranges::stable_partition(groups, std::not_fn(switchesAService));
+    std::stable_partition(groups.begin(), groups.end(), std::not_fn(switchesAService));
     return groups;
 }
 
