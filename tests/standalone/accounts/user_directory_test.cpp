@@ -5,8 +5,6 @@
 
 #include <gtest/gtest.h>
 
-#include <sys/resource.h>
-
 #include <atomic>
 #include <thread>
 
@@ -116,36 +114,30 @@ TEST_F(UserDirectoryTest, AMissingFileMeansNoUsers) {
     EXPECT_FALSE(userByName("anna"));
 }
 
-class NoDescriptors {
-public:
-    NoDescriptors() {
-        getrlimit(RLIMIT_NOFILE, &former_);
-        const rlimit none{0, former_.rlim_max};
-        setrlimit(RLIMIT_NOFILE, &none);
-    }
-    ~NoDescriptors() { setrlimit(RLIMIT_NOFILE, &former_); }
-    NoDescriptors(const NoDescriptors&) = delete;
-    NoDescriptors& operator=(const NoDescriptors&) = delete;
-
-private:
-    rlimit former_{};
-};
-
 TEST_F(UserDirectoryTest, AFileThatCannotBeReadForAMomentIsNoEmptyOne) {
-    {
-        const NoDescriptors none;
-        EXPECT_FALSE(userByName("anna"));
-        EXPECT_FALSE(groupByName("staff"));
-    }
+    const auto make = [&](const char* passwd, const char* group) {
+        for (const char* name : {"passwd", "group"}) {
+            std::filesystem::remove(folder_.path() / name);
+        }
+        folder_.write("passwd", passwd);
+        folder_.write("group", group);
+    };
+    const auto makeUnreadable = [&] {
+        for (const char* name : {"passwd", "group"}) {
+            std::filesystem::remove(folder_.path() / name);
+            std::filesystem::create_directory(folder_.path() / name);
+        }
+    };
+    makeUnreadable();
+    EXPECT_FALSE(userByName("anna"));
+    EXPECT_FALSE(groupByName("staff"));
+    make("anna:x:1000:1000:Anna:/home/anna:/bin/sh\n", "staff:x:50:anna\n");
     EXPECT_TRUE(userByName("anna"));
     EXPECT_TRUE(groupByName("staff"));
-    folder_.write("passwd", "max:x:1003:1003:Max:/home/max:/bin/sh\n");
-    folder_.write("group", "crew:x:52:max\n");
-    {
-        const NoDescriptors none;
-        EXPECT_TRUE(userByName("anna")) << "as it was last read";
-        EXPECT_TRUE(groupByName("staff"));
-    }
+    makeUnreadable();
+    EXPECT_TRUE(userByName("anna")) << "as it was last read";
+    EXPECT_TRUE(groupByName("staff"));
+    make("max:x:1003:1003:Max:/home/max:/bin/sh\n", "crew:x:52:max\n");
     EXPECT_TRUE(userByName("max"));
     EXPECT_TRUE(groupByName("crew"));
     EXPECT_FALSE(groupByName("staff"));
