@@ -134,8 +134,7 @@ TEST(Clock, MomentsAreReadInSeveralForms) {
     for (const char* text : {"", "x", "1970-01-01T00:00", "1970-01-01T00:00:01+01:00", "-1", "1970-13-01"}) {
         EXPECT_FALSE(parseTimestamp(text)) << text;
     }
-    EXPECT_EQ(velt::timestamp(velt::TimePoint(std::chrono::milliseconds(1'250))),
-              "1970-01-01T00:00:01.250Z");
+    EXPECT_EQ(velt::timestamp(velt::TimePoint(std::chrono::milliseconds(1'250))), "1970-01-01T00:00:01.250Z");
 }
 
 } // namespace
