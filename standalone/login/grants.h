@@ -32,8 +32,8 @@ public:
     /// removed, whoever the user is.
     std::vector<Restriction> restrictionsBelow(const std::filesystem::path& place, Access access) const;
 
-    /// The shares below `place` whose folders are not there. Who could write to it could bring others there
-    /// under their grants, and would be held by none in the right ones, wherever these are now.
+    /// The shares below `place` whose folders are missing. Somebody who may write there could put another
+    /// folder in the place of one, and the right one, wherever it is now, has no restrictions.
     std::vector<std::string> missingBelow(const std::filesystem::path& place) const;
 
 private:

@@ -55,7 +55,7 @@ void renderServer(Text& text, const ProftpdPlaces& places) {
     text.line("TransferLog none");
     text.line("WtmpLog off");
     text.line("UseReverseDNS off");
-    // Who may write to a folder would make rules for everybody with a file .ftpaccess.
+    // Otherwise anybody who may write to a folder makes rules for all who use it, in a file .ftpaccess.
     text.line("AllowOverride off");
     text.line("AllowOverwrite on");
     // Without it neither APPE nor the resumption of a broken upload is allowed.

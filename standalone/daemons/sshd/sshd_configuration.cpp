@@ -12,7 +12,7 @@ std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places) {
     }
     text += "PidFile none\n"
             "PermitRootLogin no\n"
-            // Many may log in at once; those of one address who do not are few, and not for long.
+            // Many may log in at once. Without a login, one address has few places, and not for long.
             "LoginGraceTime 30\n"
             "MaxStartups 200:30:1000\n"
             "PerSourceMaxStartups 20\n"
