@@ -1,6 +1,7 @@
 #include "tests/cli/cli_test.h"
 
 #include "cli/console.h"
+#include "tests/support/files.h"
 
 #include <CLI/CLI.hpp>
 
@@ -10,35 +11,8 @@
 #include <unistd.h>
 
 #include <cstdlib>
-#include <filesystem>
-#include <fstream>
 #include <sstream>
 #include <stdexcept>
-
-TemporaryFolder::TemporaryFolder() {
-    std::string name = (std::filesystem::temp_directory_path() / "velt-cli-XXXXXX").string();
-    if (mkdtemp(name.data()) == nullptr) {
-        throw std::runtime_error("cannot make a temporary folder");
-    }
-    path_ = name;
-}
-
-TemporaryFolder::~TemporaryFolder() {
-    std::error_code ignored;
-    std::filesystem::remove_all(path_, ignored);
-}
-
-std::string TemporaryFolder::write(const std::string& name, const std::string& text) const {
-    std::ofstream(path(name)) << text;
-    return path(name);
-}
-
-std::string contentOf(const std::string& path) {
-    std::ifstream file(path);
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
-}
 
 RunResult CliTest::run(const Words& words, const std::string& input) {
     std::istringstream in(input);
@@ -113,7 +87,8 @@ RunResult runProcess(const std::vector<std::string>& arguments, const std::vecto
     if (error != 0 || waitpid(child, &status, 0) != child) {
         throw std::runtime_error("cannot run " + words.front());
     }
-    return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), contentOf(out), contentOf(err)};
+    return {WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status), velt::test::contentsOf(out),
+            velt::test::contentsOf(err)};
 }
 
 namespace {

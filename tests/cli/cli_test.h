@@ -4,6 +4,7 @@
 
 #include "cli/program.h"
 #include "tests/cli/fake_host.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 
@@ -19,24 +20,19 @@ struct RunResult {
     std::string err;
 };
 
-/// A folder that lives as long as the object.
+/// A folder of the test's own, by names as texts, which commands take.
 class TemporaryFolder {
 public:
-    TemporaryFolder();
-    ~TemporaryFolder();
-    TemporaryFolder(const TemporaryFolder&) = delete;
-    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
-
-    std::string path(const std::string& name) const { return path_ + "/" + name; }
+    std::string path(const std::string& name) const { return (folder_.path() / name).string(); }
 
     /// Writes a file and returns its path.
-    std::string write(const std::string& name, const std::string& text) const;
+    std::string write(const std::string& name, const std::string& text) const {
+        return folder_.write(name, text).string();
+    }
 
 private:
-    std::string path_;
+    velt::test::TemporaryFolder folder_;
 };
-
-std::string contentOf(const std::string& path);
 
 class CliTest : public testing::Test {
 protected:

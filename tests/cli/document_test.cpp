@@ -1,5 +1,7 @@
 #include "tests/cli/cli_test.h"
 
+#include "tests/support/files.h"
+
 #include <sys/resource.h>
 #include <sys/stat.h>
 
@@ -33,7 +35,7 @@ TEST_F(DocumentTest, AnExportGoesIntoAFile) {
     const RunResult result = run({"export", "--output", folder.path("settings.json")});
     EXPECT_EQ(result.code, 0);
     EXPECT_EQ(result.out, "");
-    EXPECT_EQ(jsonOf(contentOf(folder.path("settings.json"))), exported());
+    EXPECT_EQ(jsonOf(velt::test::contentsOf(folder.path("settings.json"))), exported());
     EXPECT_EQ(run({"export", "--output", folder.path("absent/settings.json")}).code, 1);
     EXPECT_EQ(run({"export", "--output", "/dev/full"}).code, 1);
 }
@@ -55,10 +57,10 @@ TEST_F(DocumentTest, AnExportThatCannotBeWrittenKeepsTheFormerOne) {
     std::signal(SIGXFSZ, handler);
     EXPECT_EQ(result.code, 1);
     EXPECT_NE(result.err.find("with free space"), std::string::npos) << result.err;
-    EXPECT_EQ(contentOf(file), "the former export");
+    EXPECT_EQ(velt::test::contentsOf(file), "the former export");
 
     EXPECT_EQ(run({"export", "--output", link}).code, 0);
-    EXPECT_EQ(jsonOf(contentOf(file)), exported());
+    EXPECT_EQ(jsonOf(velt::test::contentsOf(file)), exported());
     EXPECT_TRUE(std::filesystem::is_symlink(link));
     EXPECT_EQ(std::filesystem::status(file).permissions(), std::filesystem::perms(0640));
 }
