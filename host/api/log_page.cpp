@@ -148,7 +148,7 @@ Json::Value toObject(const LogEntry& entry) {
 }
 
 Route logRoute() {
-    return {"GET", {"api", "log"}, false, RequestOrder::Kind::unordered, [](const Call& call) {
+    return {"GET", {"api", "log"}, false, RequestOrder::Kind::search, [](const Call& call) {
                 try {
                     return answerPage(parseQuery(call.request.query()), call);
                 } catch (const BadFilter& bad) {

@@ -12,13 +12,9 @@ constexpr unsigned unorderedThreads = 2;
 
 RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting, std::size_t maxWaitingBytes)
     : maxWaiting_(maxWaiting), maxWaitingBytes_(maxWaitingBytes) {
-    threads_.reserve(threads + unorderedThreads);
-    for (unsigned i = 0; i < threads; ++i) {
-        threads_.emplace_back([this] { work(ordered_); });
-    }
-    for (unsigned i = 0; i < unorderedThreads; ++i) {
-        threads_.emplace_back([this] { work(unordered_); });
-    }
+    start(ordered_, threads);
+    start(unordered_, unorderedThreads);
+    start(searches_, 1);
 }
 
 RequestOrder::~RequestOrder() {
@@ -26,7 +22,7 @@ RequestOrder::~RequestOrder() {
 }
 
 bool RequestOrder::submit(Kind kind, Task task, std::size_t bytes) {
-    Pool& pool = kind == Kind::unordered ? unordered_ : ordered_;
+    Pool& pool = poolOf(kind);
     {
         const std::lock_guard lock(mutex_);
         if (stopping_ || pool.queue.size() >= maxWaiting_ || pool.bytes + bytes > maxWaitingBytes_) {
@@ -44,8 +40,9 @@ void RequestOrder::stop() {
         const std::lock_guard lock(mutex_);
         stopping_ = true;
     }
-    ordered_.changed.notify_all();
-    unordered_.changed.notify_all();
+    for (Pool* const pool : {&ordered_, &unordered_, &searches_}) {
+        pool->changed.notify_all();
+    }
     for (std::thread& thread : threads_) {
         if (thread.joinable()) {
             thread.join();
@@ -53,8 +50,32 @@ void RequestOrder::stop() {
     }
 }
 
+RequestOrder::Pool& RequestOrder::poolOf(Kind kind) {
+    switch (kind) {
+    case Kind::unordered:
+        return unordered_;
+    case Kind::search:
+        return searches_;
+    default:
+        return ordered_;
+    }
+}
+
+void RequestOrder::start(Pool& pool, unsigned threads) {
+    for (unsigned i = 0; i < threads; ++i) {
+        threads_.emplace_back([this, &pool] { work(pool); });
+    }
+}
+
 bool RequestOrder::mayStart(Kind kind) const {
-    return kind == Kind::unordered || (!writing_ && (kind == Kind::read || reading_ == 0));
+    switch (kind) {
+    case Kind::read:
+        return !writing_;
+    case Kind::write:
+        return !writing_ && reading_ == 0;
+    default:
+        return true;
+    }
 }
 
 void RequestOrder::note(Kind kind, bool runs) {

@@ -12,22 +12,23 @@
 
 namespace velt::host {
 
-/// Two pools of threads. A write runs alone; a read that comes after a waiting write waits for it, so that
-/// writes do not starve. Requests that need no module have threads of their own, so modules that block do not
-/// delay them.
+/// A write runs alone; a read that comes after a waiting write waits for it, so that writes do not starve.
+/// Requests that need no module have threads of their own, so modules that block do not delay them; and those
+/// among them that may take long have another one.
 class RequestOrder {
 public:
     enum class Kind {
         read,
         write,
         unordered, ///< needs no module: runs beside anything
+        search,    ///< the same, but may take long: one at a time
     };
 
     /// Tasks must not throw.
     using Task = std::function<void()>;
 
-    /// `threads` are for reads and writes. Of each kind, ordered and unordered, at most `maxWaiting` may
-    /// wait, and hold at most `maxWaitingBytes`.
+    /// `threads` are for reads and writes. Of these, of unordered requests and of searches, at most
+    /// `maxWaiting` each may wait, and hold at most `maxWaitingBytes`.
     RequestOrder(unsigned threads, std::size_t maxWaiting, std::size_t maxWaitingBytes);
 
     /// Calls stop().
@@ -55,6 +56,8 @@ private:
         std::condition_variable changed;
     };
 
+    Pool& poolOf(Kind kind);
+    void start(Pool& pool, unsigned threads);
     void work(Pool& pool);
     bool mayStart(Kind kind) const;
     void note(Kind kind, bool runs);
@@ -64,6 +67,7 @@ private:
     std::mutex mutex_;
     Pool ordered_;
     Pool unordered_;
+    Pool searches_;
     int reading_ = 0;
     bool writing_ = false;
     bool stopping_ = false;

@@ -34,19 +34,31 @@ constexpr const char* tableSql = R"(
         sentence TEXT NOT NULL,
         actor TEXT NOT NULL,
         address TEXT NOT NULL);
-    CREATE INDEX entry_time ON entry (time);
     PRAGMA user_version = 1;
+)";
+
+// A database without them, of an earlier release, gets them when it is opened. Each also holds the id, so a
+// page of what one of them finds needs no sorting.
+constexpr const char* indexSql = R"(
+    CREATE INDEX IF NOT EXISTS entry_time ON entry (time);
+    CREATE INDEX IF NOT EXISTS entry_event ON entry (event);
+    CREATE INDEX IF NOT EXISTS entry_actor ON entry (actor);
 )";
 
 constexpr const char* insertSql =
     "INSERT INTO entry (time, category, level, event, text1, text2, text3, text4, sentence, actor, address) "
     "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11)";
 
-constexpr const char* querySql =
-    "SELECT id, time, category, level, event, text1, text2, text3, text4, sentence, actor, address FROM "
-    "entry "
-    "WHERE (?1 IS NULL OR time >= ?1) AND (?2 IS NULL OR event = ?2) AND (?3 IS NULL OR actor = ?3) "
-    "AND (?4 IS NULL OR id < ?4) ORDER BY id DESC LIMIT ?5";
+/// Names only the columns that the filter does: SQLite finds no index for a condition that may not apply.
+std::string querySql(const LogFilter& filter) {
+    std::string sql = "SELECT id, time, category, level, event, text1, text2, text3, text4, sentence, actor, "
+                      "address FROM entry WHERE TRUE";
+    sql += filter.since ? " AND time >= ?1" : "";
+    sql += filter.event ? " AND event = ?2" : "";
+    sql += filter.actor ? " AND actor = ?3" : "";
+    sql += filter.beforeId ? " AND id < ?4" : "";
+    return sql + " ORDER BY id DESC LIMIT ?5";
+}
 
 std::int64_t millisecondsOf(std::chrono::system_clock::time_point time) {
     return std::chrono::floor<std::chrono::milliseconds>(time.time_since_epoch()).count();
@@ -88,7 +100,6 @@ struct LogDatabase::Statements {
     Statement insert;
     Statement removeByCount;
     Statement removeByAge;
-    Statement query;
 };
 
 LogDatabase::LogDatabase(std::filesystem::path path) : path_(std::move(path)), process_(getpid()) {}
@@ -145,7 +156,8 @@ Result<> LogDatabase::makeTable() {
         return Error(ErrorNumber::log, "The administrator log " + path_.string() + " has format " +
                                            std::to_string(found) + ", which this version does not know.");
     }
-    if (found == 0 && execute(database_, tableSql) != SQLITE_OK) {
+    if ((found == 0 && execute(database_, tableSql) != SQLITE_OK) ||
+        execute(database_, indexSql) != SQLITE_OK) {
         return cannotBe("made");
     }
     return execute(database_, "COMMIT") == SQLITE_OK ? Result<>() : cannotBe("made");
@@ -159,8 +171,7 @@ Result<> LogDatabase::prepareStatements() {
     if (prepared(statements_->begin, "BEGIN IMMEDIATE") && prepared(statements_->commit, "COMMIT") &&
         prepared(statements_->insert, insertSql) &&
         prepared(statements_->removeByCount, "DELETE FROM entry WHERE id <= ?1") &&
-        prepared(statements_->removeByAge, "DELETE FROM entry WHERE time < ?1") &&
-        prepared(statements_->query, querySql)) {
+        prepared(statements_->removeByAge, "DELETE FROM entry WHERE time < ?1")) {
         return {};
     }
     return cannotBe("used");
@@ -230,7 +241,10 @@ int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention
 }
 
 Result<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
-    Statement& query = statements_->query;
+    Statement query;
+    if (query.prepare(database_, querySql(filter).c_str()) != SQLITE_OK) {
+        return cannotBe("read");
+    }
     query.bind(1, filter.since ? std::optional(millisecondsOf(*filter.since)) : std::nullopt);
     query.bind(2, filter.event ? std::optional(std::int64_t{*filter.event}) : std::nullopt);
     query.bind(3, filter.actor);
@@ -252,10 +266,7 @@ Result<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
         entry.actor = query.text(10);
         entry.address = query.text(11);
     }
-    Result<std::vector<LogEntry>> outcome =
-        result == SQLITE_DONE ? Result<std::vector<LogEntry>>(std::move(entries)) : cannotBe("read");
-    query.reset();
-    return outcome;
+    return result == SQLITE_DONE ? Result<std::vector<LogEntry>>(std::move(entries)) : cannotBe("read");
 }
 
 } // namespace velt

@@ -177,6 +177,30 @@ TEST(RequestOrder, AReadThatComesAfterAWaitingWriteWaitsForIt) {
     EXPECT_EQ(sequence, "1W2");
 }
 
+TEST(RequestOrder, SearchesDelayNothingElse) {
+    RequestOrder order(1, 100, 0);
+    std::promise<void> release;
+    const std::shared_future<void> released = release.get_future().share();
+    std::atomic<int> running{0};
+    std::atomic<int> most{0};
+    for (int i = 0; i < 10; ++i) {
+        ASSERT_TRUE(order.submit(Kind::search, [&, released] {
+            most = std::max<int>(most, ++running);
+            released.wait();
+            --running;
+        }));
+    }
+    std::promise<void> unordered;
+    std::promise<void> ordered;
+    ASSERT_TRUE(order.submit(Kind::unordered, [&] { unordered.set_value(); }));
+    ASSERT_TRUE(order.submit(Kind::write, [&] { ordered.set_value(); }));
+    EXPECT_EQ(unordered.get_future().wait_for(std::chrono::seconds(10)), std::future_status::ready);
+    EXPECT_EQ(ordered.get_future().wait_for(std::chrono::seconds(10)), std::future_status::ready);
+    release.set_value();
+    order.stop();
+    EXPECT_EQ(most, 1);
+}
+
 TEST(RequestOrder, AStopFinishesWhatWaitsAndTakesNoMore) {
     RequestOrder order(2, 100, 0);
     std::atomic<int> done{0};

@@ -215,6 +215,21 @@ TEST_F(AdminLogTest, AFormFromTheFutureIsLeftAlone) {
     EXPECT_NE(refused.find("has format 2"), std::string::npos) << refused;
 }
 
+TEST_F(AdminLogTest, ALogOfAnEarlierReleaseGetsItsIndexes) {
+    logUser("a");
+    test::TemporaryFolder other;
+    setStateRoot(other.path());
+    logUser("elsewhere");
+    sqlite3* database = nullptr;
+    ASSERT_EQ(sqlite3_open((folder_.path() / "var/lib/velt/log.db").c_str(), &database), SQLITE_OK);
+    const char* const drop = "DROP INDEX entry_actor; DROP INDEX entry_event";
+    ASSERT_EQ(sqlite3_exec(database, drop, nullptr, nullptr, nullptr), SQLITE_OK);
+    setStateRoot(folder_.path());
+    EXPECT_EQ(firstTexts(query()), Lines{"a"});
+    EXPECT_EQ(sqlite3_exec(database, drop, nullptr, nullptr, nullptr), SQLITE_OK) << sqlite3_errmsg(database);
+    sqlite3_close(database);
+}
+
 TEST_F(AdminLogTest, StartsAnewWhenTheFileWasMovedAway) {
     logUser("old");
     for (const char* name : {"log.db", "log.db-wal", "log.db-shm"})
