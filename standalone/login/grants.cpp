@@ -9,74 +9,88 @@
 namespace velt {
 namespace {
 
-// "" for the folder itself; begins with ".." when `place` is outside `outer`.
-std::filesystem::path within(const std::filesystem::path& place, const std::filesystem::path& outer) {
-    const auto relative = place.lexically_relative(outer);
-    return relative == "." ? std::filesystem::path() : relative;
+/// Ends with '/', so that it begins with the keys of the places around it, and with no other's.
+std::string keyOf(const std::filesystem::path& place) {
+    std::string key = place.string();
+    if (!key.ends_with('/')) {
+        key += '/';
+    }
+    return key;
 }
 
-bool isStrictlyBelow(const std::filesystem::path& place, const std::filesystem::path& outer) {
-    const auto relative = within(place, outer);
-    return !relative.empty() && *relative.begin() != "..";
-}
-
-bool contains(const std::filesystem::path& outer, const std::filesystem::path& place) {
-    return place == outer || isStrictlyBelow(place, outer);
+/// The grant, or what the file system allows where that is less.
+std::optional<Access> toldOf(const Identity& user, const ShareEntry& share) {
+    const auto grant = grantTo(user, share);
+    return grant && *grant != Access::none ? std::min(*grant, accessTo(user, share.path)) : grant;
 }
 
 } // namespace
 
-Grants::Grants(const Identity& user, const std::vector<ShareEntry>& shares) : user_(user) {
+Grants::Grants(const Identity& user, const std::vector<ShareEntry>& shares) {
+    known_.reserve(shares.size());
     for (const ShareEntry& share : shares) {
         const Walk way = walk(share.path);
         const auto reached = placeOf(way.folder);
         const bool found = reached && way.ended;
-        known_.push_back({&share, found ? *reached : reached.valueOr("/") / way.rest, found});
+        const auto place = found ? *reached : reached.valueOr("/") / way.rest;
+        known_.push_back({&share, place, found, toldOf(user, share), keyOf(place)});
     }
-    std::ranges::stable_sort(
-        known_, {}, [](const Known& known) { return std::distance(known.place.begin(), known.place.end()); });
+    std::ranges::stable_sort(known_, {}, &Known::key);
 }
 
-std::optional<Access> Grants::told(const ShareEntry& share) const {
-    const auto access = accessOf(user_, share);
-    return access ? *access : Access::none;
+Grants::Range Grants::at(const std::string& key) const {
+    return {std::ranges::lower_bound(known_, key, {}, &Known::key),
+            std::ranges::upper_bound(known_, key, {}, &Known::key)};
+}
+
+Grants::Range Grants::strictlyBelow(const std::filesystem::path& place) const {
+    const std::string outer = keyOf(place);
+    const auto first = std::ranges::upper_bound(known_, outer, {}, &Known::key);
+    const auto last = std::find_if(first, known_.end(),
+                                   [&outer](const Known& known) { return !known.key.starts_with(outer); });
+    return {first, last};
+}
+
+template<class Visit> void Grants::around(const std::filesystem::path& place, const Visit& visit) const {
+    const std::string key = keyOf(place);
+    for (auto end = key.find('/'); end != std::string::npos; end = key.find('/', end + 1)) {
+        std::ranges::for_each(at(key.substr(0, end + 1)), visit);
+    }
 }
 
 Access Grants::on(const ShareEntry& share) const {
     const auto self = std::ranges::find(known_, &share, &Known::share);
-    Access access = told(share).value_or(Access::none);
-    for (const Known& known : known_) {
-        if (known.share != &share && contains(known.place, self->place)) {
-            access = std::min(access, told(*known.share).value_or(access));
-        }
-    }
+    Access access = self->told.value_or(Access::none);
+    around(self->place,
+           [&access](const Known& known) { access = std::min(access, known.told.value_or(access)); });
     return access;
 }
 
 Access Grants::leastAt(const std::filesystem::path& place, const std::filesystem::path& outer,
                        Access access) const {
-    for (const Known& known : known_) {
-        if (isStrictlyBelow(known.place, outer) && contains(known.place, place)) {
-            access = std::min(access, told(*known.share).value_or(Access::none));
+    const std::string limit = keyOf(outer);
+    around(place, [&](const Known& known) {
+        if (known.key != limit && known.key.starts_with(limit)) {
+            access = std::min(access, known.told.value_or(Access::none));
         }
-    }
+    });
     return access;
 }
 
 std::vector<Restriction> Grants::restrictionsBelow(const std::filesystem::path& place, Access access) const {
     std::map<std::filesystem::path, Access> restrictions; // an outer one comes before those in it
-    for (const Known& known : known_) {
-        if (!known.found || !isStrictlyBelow(known.place, place)) {
+    for (const Known& known : strictlyBelow(place)) {
+        if (!known.found) {
             continue;
         }
-        const auto folder = within(known.place, place);
+        const auto folder = known.place.lexically_relative(place);
         std::filesystem::path way;
         for (const auto& part : folder.parent_path()) {
             way /= part;
             restrictions.emplace(way, access);
         }
         Access& here = restrictions.emplace(folder, access).first->second;
-        here = std::min(here, told(*known.share).value_or(Access::none));
+        here = std::min(here, known.told.value_or(Access::none));
     }
     std::vector<Restriction> all;
     all.reserve(restrictions.size());
@@ -88,8 +102,8 @@ std::vector<Restriction> Grants::restrictionsBelow(const std::filesystem::path& 
 
 std::vector<std::string> Grants::missingBelow(const std::filesystem::path& place) const {
     std::vector<std::string> names;
-    for (const Known& known : known_) {
-        if (!known.found && isStrictlyBelow(known.place, place)) {
+    for (const Known& known : strictlyBelow(place)) {
+        if (!known.found) {
             names.push_back(known.share->name);
         }
     }

@@ -6,6 +6,7 @@
 #include "standalone/shares/share_entry.h"
 
 #include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -16,7 +17,7 @@ namespace velt {
 /// is mounted in two places, only the share's own path counts.
 class Grants {
 public:
-    /// Both must outlive this.
+    /// The shares must outlive this. Asks once for each share: this is a login's view of them at one moment.
     Grants(const Identity& user, const std::vector<ShareEntry>& shares);
 
     /// What the store grants or the file system allows, whichever is less; none when the store says nothing
@@ -40,14 +41,19 @@ private:
     struct Known {
         const ShareEntry* share;
         std::filesystem::path place;
-        bool found; ///< else the place is where it should be
+        bool found;                 ///< else the place is where it should be
+        std::optional<Access> told; ///< nothing when the store says nothing
+        std::string key;            ///< of the place; begins with the key of each place around it
     };
+    using Range = std::span<const Known>;
 
-    /// Nothing when the store says nothing.
-    std::optional<Access> told(const ShareEntry& share) const;
+    /// Those whose folder is this place.
+    Range at(const std::string& key) const;
+    Range strictlyBelow(const std::filesystem::path& place) const;
+    /// Calls `visit` for those at the place and around it, outer ones first.
+    template<class Visit> void around(const std::filesystem::path& place, const Visit& visit) const;
 
-    const Identity& user_;
-    std::vector<Known> known_; ///< outer ones come first
+    std::vector<Known> known_; ///< by key
 };
 
 } // namespace velt

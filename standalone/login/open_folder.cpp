@@ -150,6 +150,23 @@ Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::p
     return opened;
 }
 
+Access accessTo(const Identity& user, const std::filesystem::path& path) {
+    if (user.gids.empty()) {
+        return Access::none;
+    }
+    const FileRightsOf rights(user);
+    const UniqueFd folder(rights.taken() ? open(path.c_str(), asFolder) : -1);
+    // The system call itself: where it is missing, the C library would answer for the process's numbers,
+    // root's.
+    const auto may = [&](int mode) {
+        return syscall(SYS_faccessat2, folder.get(), "", mode, AT_EACCESS | AT_EMPTY_PATH) == 0;
+    };
+    if (!folder || !may(R_OK | X_OK)) {
+        return Access::none;
+    }
+    return may(W_OK) ? Access::write : Access::read;
+}
+
 Result<OpenedFolder> openFolderBelow(const Identity& user, const UniqueFd& folder,
                                      const std::filesystem::path& path) {
     return openAs(user, path,

@@ -34,6 +34,10 @@ Walk walk(const std::filesystem::path& path);
 /// The end of such a walk, with the user's rights. An error for "/", the whole server.
 Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::path& path);
 
+/// What the file system lets the user do with the folder: read when it can be reached, listed and entered,
+/// write when files can be made in it, too. Follows links as the user would. none when it cannot be asked.
+Access accessTo(const Identity& user, const std::filesystem::path& path);
+
 /// With the user's rights, and never outside `folder`, even while folders and links are being moved. `path`
 /// is relative and not empty.
 Result<OpenedFolder> openFolderBelow(const Identity& user, const UniqueFd& folder,

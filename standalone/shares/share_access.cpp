@@ -29,11 +29,6 @@ std::optional<Access> grantToGroups(const ShareEntry& share, const std::vector<g
     return best;
 }
 
-std::optional<Access> grantToUser(const ShareEntry& share, const Identity& user) {
-    const auto entry = share.users.find(user.name);
-    return entry != share.users.end() ? entry->second : grantToGroups(share, user.gids);
-}
-
 /// The grant, or what the file system allows this account where that is less.
 Result<std::optional<Access>> limited(std::optional<Access> grant, const ShareEntry& share,
                                       const Identity& who) {
@@ -46,8 +41,13 @@ Result<std::optional<Access>> limited(std::optional<Access> grant, const ShareEn
 
 } // namespace
 
+std::optional<Access> grantTo(const Identity& user, const ShareEntry& share) {
+    const auto entry = share.users.find(user.name);
+    return entry != share.users.end() ? entry->second : grantToGroups(share, user.gids);
+}
+
 Result<std::optional<Access>> accessOf(const Identity& user, const ShareEntry& share) {
-    return limited(grantToUser(share, user), share, user);
+    return limited(grantTo(user, share), share, user);
 }
 
 Result<std::optional<Access>> accessOf(const std::string& account, const ShareEntry& share) {

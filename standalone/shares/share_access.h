@@ -11,9 +11,12 @@
 
 namespace velt {
 
-/// What the store grants this user or the file system allows, whichever is less. An entry for the user comes
-/// before those for groups; among these a refusal comes first, then the right to write. Nothing when the
-/// store says nothing about the user. Thread-safe.
+/// What the store grants this user, whatever the file system allows. An entry for the user comes before those
+/// for groups; among these a refusal comes first, then the right to write. Nothing when the store says
+/// nothing about the user. Thread-safe.
+std::optional<Access> grantTo(const Identity& user, const ShareEntry& share);
+
+/// What the store grants this user or the file system allows, whichever is less. Thread-safe.
 Result<std::optional<Access>> accessOf(const Identity& user, const ShareEntry& share);
 
 /// The same for the user or, when there is no such user, the group of this name. For a group, the file system

@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -77,6 +78,34 @@ TEST_F(GrantsTest, pinTheFoldersOnTheWay) {
     share("outer/a/b", Access::read);
     EXPECT_EQ(restrictionsBelow("outer"), "a write, a/b read, a/b/deep read")
         << "the file system does not let her write to the last one";
+}
+
+TEST_F(GrantsTest, doNotMixFoldersWhoseNamesBeginAlike) {
+    fs::create_directories(top_ / "outer-2/inner");
+    share("outer", Access::read);
+    share("outer-2/inner", Access::none);
+    share("outer-2", Access::write);
+    fs::permissions(top_ / "outer-2", fs::perms::all);
+    const Grants grants(user_, shares_);
+    EXPECT_EQ(restrictionsBelow("outer"), "");
+    EXPECT_EQ(restrictionsBelow("outer-2"), "inner none");
+    EXPECT_EQ(grants.on(shares_[2]), Access::write);
+    EXPECT_EQ(grants.leastAt(top_ / "outer-2", top_, Access::write), Access::write);
+}
+
+// A login must not take the longer the more shares there are.
+TEST_F(GrantsTest, areAskedWithoutAProcessForEach) {
+    for (int i = 0; i < 20; i++) {
+        share("outer", Access::write);
+    }
+    const auto usedByChildren = [] {
+        rusage usage{};
+        getrusage(RUSAGE_CHILDREN, &usage);
+        return usage.ru_minflt;
+    };
+    const auto before = usedByChildren();
+    EXPECT_EQ(Grants(user_, shares_).on(shares_.back()), Access::write);
+    EXPECT_EQ(usedByChildren(), before);
 }
 
 TEST_F(GrantsTest, tellWhichFoldersAreMissing) {
