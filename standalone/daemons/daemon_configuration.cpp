@@ -20,6 +20,11 @@ bool isRenderable(const std::filesystem::path& path) {
            text.find_first_of("\"\\%*") == std::string::npos;
 }
 
+bool isPlainName(const std::string& name) {
+    return name.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789._-") ==
+           std::string::npos;
+}
+
 Result<> checkRenderable(const std::filesystem::path& path, const std::filesystem::path& folder) {
     if (isRenderable(path)) {
         return {};

@@ -14,6 +14,9 @@ namespace velt {
 /// the characters that mean something to a daemon even there.
 bool isRenderable(const std::filesystem::path& path);
 
+/// Whether the account's name is of letters, digits, '.', '_' and '-', which mean nothing to any daemon.
+bool isPlainName(const std::string& name);
+
 /// Fails, naming the administrator's folder that the path is below, unless the path is renderable.
 Result<> checkRenderable(const std::filesystem::path& path, const std::filesystem::path& folder);
 

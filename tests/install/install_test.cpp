@@ -61,6 +61,7 @@ TEST_F(Installation, holdsTheseFilesAndNoOthers) {
         library + "VELT.Core.FileServ.FTP.so",
         library + "libvelt-standalone.so",
         helper + "mod_velt_login.so",
+        helper + "velt-authorized-keys",
         helper + "velt-login-view",
         helper + "velt-supervise",
         "lib/systemd/system/veltd.service",

@@ -29,6 +29,7 @@ protected:
         if (!whyNoWorld().empty()) {
             GTEST_SKIP() << whyNoWorld();
         }
+        setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
         setStateRoot(worldRoot);
         const auto made = runProcess({"ssh-keygen", "-q", "-t", "ed25519", "-N", "", "-f", key_});
         ASSERT_EQ(made.exitCode, 0) << made.errors;
@@ -114,6 +115,40 @@ TEST_F(SftpService, givesNoShellAndForwardsNothing) {
     const auto tunnel = runProcess(forward, {}, std::chrono::seconds(20));
     EXPECT_NE(tunnel.exitCode, 0);
     EXPECT_EQ(tunnel.output.find("SSH-2.0"), std::string::npos) << tunnel.output;
+}
+
+TEST_F(SftpService, aKeyThatIsRestrictedToACommandOpensNothing) {
+    const fs::path keys = "/mnt/home/alice/.ssh/authorized_keys";
+    const std::string key = contentsOf(key_ + ".pub");
+    start(port);
+    for (const char* const options : {"restrict,command=\"/bin/false\" ", "COMMAND=\"internal-sftp -R\" "}) {
+        writeFile(keys, options + key, aliceId);
+        EXPECT_NE(sftp("get file /mnt/got\n").exitCode, 0) << options;
+        EXPECT_FALSE(fs::exists("/mnt/got"));
+    }
+    writeFile(keys, "restrict,from=\"127.0.0.1\" " + key, aliceId);
+    EXPECT_EQ(sftp("ls file\n").exitCode, 0);
+    fs::permissions(keys, fs::perms(0620));
+    EXPECT_NE(sftp("ls file\n").exitCode, 0) << "others may have written the key";
+}
+
+TEST_F(SftpService, aCertificateThatIsRestrictedToACommandOpensNothing) {
+    const std::string certificate = key_ + "-cert.pub";
+    const auto sign = [&](std::vector<std::string> options) {
+        std::vector<std::string> arguments{"ssh-keygen", "-q", "-s", key_, "-I", "id", "-n", "alice"};
+        arguments.insert(arguments.end(), options.begin(), options.end());
+        arguments.push_back(key_ + ".pub");
+        const auto signing = runProcess(arguments);
+        EXPECT_EQ(signing.exitCode, 0) << signing.errors;
+    };
+    writeFile("/mnt/home/alice/.ssh/authorized_keys", "cert-authority " + contentsOf(key_ + ".pub"), aliceId);
+    start(port);
+    EXPECT_NE(sftp("ls file\n").exitCode, 0) << "it is the authority's key";
+    sign({});
+    EXPECT_EQ(sftp("ls file\n").exitCode, 0);
+    sign({"-O", "force-command=/bin/false"});
+    EXPECT_NE(sftp("ls file\n").exitCode, 0);
+    fs::remove(certificate);
 }
 
 TEST_F(SftpService, refusesRootAndStrangers) {

@@ -62,11 +62,6 @@ Result<> surveyCertificate(FtpSurroundings& found) {
     return {};
 }
 
-bool isPlainName(const std::string& name) {
-    return name.find_first_not_of("abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789._-") ==
-           std::string::npos;
-}
-
 // Without root's rights the daemon stays who it is, and knows the accounts of its own files only.
 Result<> surveyRights(ProftpdPlaces& places) {
     if (geteuid() == 0) {

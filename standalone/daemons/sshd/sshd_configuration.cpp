@@ -20,6 +20,12 @@ std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places) {
             "PrintMotd no\n"
             "UseDNS no\n";
     text += places.privileged ? "UsePAM yes\n" : "UsePAM no\n";
+    // A key that is restricted to a command would get file transfer in its place, and with that, write itself
+    // a better line. So the daemon does not read the users' files itself. It starts no program of a folder
+    // that others than root may change, as where this one is built; env is the system's own.
+    text += "AuthorizedKeysFile none\n"
+            "AuthorizedKeysCommand /usr/bin/env \"" +
+            places.keysProgram.string() + "\" %u\n" + "AuthorizedKeysCommandUser " + places.ownUser + "\n";
     // A session may transfer files and do nothing else.
     text += "DisableForwarding yes\n"
             "PermitTTY no\n"

@@ -2,7 +2,9 @@
 
 #include "base/file.h"
 #include "base/sha256.h"
+#include "standalone/accounts/user_directory.h"
 #include "standalone/core/error_number.h"
+#include "standalone/core/installed_files.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/scratch_folder.h"
 #include "standalone/core/state_lock.h"
@@ -33,6 +35,14 @@ Result<> makeSeparationFolder() {
                  std::string("Cannot make the folder /run/sshd: ") + std::strerror(errno) + ".");
 }
 
+Result<std::string> ownUser() {
+    const auto user = userById(geteuid());
+    if (!user || !isPlainName(user->name)) {
+        return Error(ErrorNumber::invalid, "The SFTP daemon cannot run as the user of this process.");
+    }
+    return user->name;
+}
+
 /// A configuration and what it names.
 struct Rendering {
     std::string text;
@@ -43,8 +53,12 @@ Result<Rendering> render(const SftpSettings& settings) {
     VELT_RETURN_IF_ERROR(makeSeparationFolder());
     VELT_ASSIGN_OR_RETURN(auto keys, hostKeys());
     VELT_RETURN_IF_ERROR(checkRenderable(keys.files.front(), statePath("/")));
+    const auto keysProgram = installedFile("velt-authorized-keys");
+    VELT_RETURN_IF_ERROR(checkRenderable(keysProgram, keysProgram.parent_path()));
+    VELT_ASSIGN_OR_RETURN(const auto user, ownUser());
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
-    std::string text = renderSshd(settings, {keys.files, geteuid() == 0, network.loopbackOnly});
+    std::string text =
+        renderSshd(settings, {keys.files, keysProgram, user, geteuid() == 0, network.loopbackOnly});
     return Rendering{std::move(text), std::move(keys)};
 }
 

@@ -15,6 +15,8 @@ namespace velt::test {
 namespace {
 
 const SshdPlaces examplePlaces{{"/var/lib/velt/ssh/host_ed25519_key", "/var/lib/velt/ssh/host_rsa_key"},
+                               "/usr/libexec/velt/velt-authorized-keys",
+                               "root",
                                true};
 
 TEST(SshdRendering, isAsRecorded) {
