@@ -36,6 +36,9 @@ Result<> makeSeparationFolder() {
 }
 
 Result<std::string> ownUser() {
+    if (geteuid() == 0) {
+        return std::string("root");
+    }
     const auto user = userById(geteuid());
     if (!user || !isPlainName(user->name)) {
         return Error(ErrorNumber::invalid, "The SFTP daemon cannot run as the user of this process.");
