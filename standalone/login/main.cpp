@@ -9,67 +9,18 @@
 // of the share for anonymous users.
 #include "base/plain_text.h"
 #include "standalone/core/state_root.h"
-#include "standalone/login/login_view.h"
+#include "standalone/login/login_arguments.h"
 
 #include <grp.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <algorithm>
-#include <array>
-#include <charconv>
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
-#include <optional>
 #include <string_view>
-#include <utility>
-#include <vector>
 
 namespace {
-
-/// In the order of DefaultView.
-constexpr std::array<std::string_view, 4> views{"home", "shares", "anonymous", "server"};
-
-std::optional<unsigned> numberOf(std::string_view text) {
-    unsigned number = 0;
-    const auto [rest, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    // The greatest number means "no change" to the kernel.
-    const bool whole = error == std::errc() && rest == text.data() + text.size();
-    return whole && number != static_cast<unsigned>(-1) ? std::optional(number) : std::nullopt;
-}
-
-std::optional<std::vector<gid_t>> numbersOf(std::string_view text) {
-    std::vector<gid_t> numbers;
-    for (;;) {
-        const auto comma = text.find(',');
-        const auto number = numberOf(text.substr(0, comma));
-        if (!number) {
-            return std::nullopt;
-        }
-        numbers.push_back(*number);
-        if (comma == std::string_view::npos) {
-            return numbers;
-        }
-        text.remove_prefix(comma + 1);
-    }
-}
-
-std::optional<velt::Login> loginOf(int count, char** arguments) {
-    if (count != 8 && count != 9) {
-        return std::nullopt;
-    }
-    const auto view = std::ranges::find(views, arguments[2]);
-    const auto uid = numberOf(arguments[5]);
-    auto gids = numbersOf(arguments[6]);
-    if (view == views.end() || !uid || !gids) {
-        return std::nullopt;
-    }
-    return velt::Login{static_cast<velt::DefaultView>(view - views.begin()),
-                       {arguments[4], *uid, std::move(*gids)},
-                       arguments[7],
-                       count == 9 ? arguments[8] : ""};
-}
 
 // The daemon may have left some of the numbers at a user's.
 bool becomeRoot() {
@@ -83,7 +34,7 @@ int refuse(std::string_view why) {
 }
 
 int run(int count, char** arguments) {
-    const auto login = loginOf(count, arguments);
+    const auto login = velt::parseLogin({arguments + 1, arguments + count});
     if (!login) {
         return refuse("usage: velt-login-view STATE VIEW ROOT USER UID GIDS HOME [FILE]");
     }
