@@ -6,15 +6,17 @@
  * gets there without this module sees nothing. When the program refuses, the login fails as with a wrong
  * password.
  *
- * No session makes a file run with the rights of its owner or group.
+ * From the login on, file_functions.h and refused_commands.h limit what the session may do there.
  */
 #include "conf.h"
 #include "privs.h"
 
+#include "standalone/login/file_functions.h"
 #include "standalone/login/login_program.h"
+#include "standalone/login/own_files.h"
+#include "standalone/login/refused_commands.h"
 
 #include <sched.h>
-#include <sys/stat.h>
 
 #define MODULE_VERSION "mod_velt_login/2.0"
 
@@ -58,6 +60,14 @@ static struct passwd* copy_account(pool* p, const char* user) {
     return copy;
 }
 
+/* Without root's rights all sessions work as the daemon's own user, so that user's home counts, too. */
+static int keep_homes(const char* home) {
+    const struct passwd* self = geteuid() != 0 ? getpwuid(geteuid()) : NULL;
+
+    velt_forget_homes();
+    return velt_keep_home(home) == 0 && (self == NULL || velt_keep_home(self->pw_dir) == 0);
+}
+
 static int run_program(pool* p, const config_rec* c, const char* kind, const char* root, const char* user) {
     char words[1024] = "cannot look up the account or its groups";
     int good = FALSE;
@@ -82,6 +92,8 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
             (void)snprintf(words, sizeof(words), "DefaultRoot is missing from the configuration");
         } else if (isolated && unshare(CLONE_NEWNS) < 0) {
             (void)snprintf(words, sizeof(words), "cannot make a mount namespace: %s", strerror(errno));
+        } else if (!keep_homes(pw->pw_dir)) {
+            (void)snprintf(words, sizeof(words), "cannot look at the home: %s", strerror(errno));
         } else {
             good = velt_run_login_program(arguments, longest_run, words, sizeof(words));
         }
@@ -144,24 +156,7 @@ static void on_chroot(const void* root, void* ignored) {
         pr_response_send(R_530, "Login incorrect.");
         pr_session_end(0);
     }
-}
-
-static int forbids(mode_t mode) {
-    if ((mode & (S_ISUID | S_ISGID)) != 0) {
-        errno = EPERM;
-        return TRUE;
-    }
-    return FALSE;
-}
-
-static int change_mode(pr_fs_t* fs, const char* path, mode_t mode) {
-    (void)fs;
-    return forbids(mode) ? -1 : chmod(path, mode);
-}
-
-static int change_mode_of_open_file(pr_fh_t* file, int descriptor, mode_t mode) {
-    (void)file;
-    return forbids(mode) ? -1 : fchmod(descriptor, mode);
+    velt_keep_root();
 }
 
 /* usage: VeltLoginView program state-root home|shares|server [file-with-the-share-of-anonymous-users] */
@@ -188,8 +183,7 @@ static int velt_sess_init(void) {
     if (files == NULL) {
         return -1;
     }
-    files->chmod = change_mode;
-    files->fchmod = change_mode_of_open_file;
+    velt_replace_file_functions(files);
     if (pr_event_register(&velt_login_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
         pr_event_register(&velt_login_module, "core.chroot", on_chroot, NULL) < 0) {
         return -1;
@@ -203,5 +197,6 @@ static conftable velt_conftab[] = {
 };
 
 module velt_login_module = {
-    NULL, NULL, 0x20, "velt_login", velt_conftab, NULL, NULL, NULL, velt_sess_init, MODULE_VERSION, NULL, 0,
+    NULL, NULL, 0x20,           "velt_login",   velt_conftab, velt_refused_commands,
+    NULL, NULL, velt_sess_init, MODULE_VERSION, NULL,         0,
 };

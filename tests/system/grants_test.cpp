@@ -99,12 +99,38 @@ TEST_F(ShareGrants, holdWhenFilesAreMovedBetweenShares) {
     EXPECT_EQ(contentsOf(writable / "file"), "rw");
     EXPECT_FALSE(fs::exists(readable / "stolen"));
     session.command("RNFR /ro/file");
-    session.command("RNTO /rw/taken");
-    EXPECT_EQ(contentsOf(readable / "file"), "ro") << "a copy at most";
+    EXPECT_EQ(session.command("RNTO /rw/taken").code, 550);
+    EXPECT_EQ(contentsOf(readable / "file"), "ro");
+    EXPECT_FALSE(fs::exists(writable / "taken")) << "not even a copy";
     EXPECT_EQ(session.command("RNFR /rw/file").code, 350);
     EXPECT_EQ(session.command("RNTO /rw2/moved").code, 250);
     EXPECT_EQ(contentsOf("/mnt/srv/rw2/moved"), "rw");
     EXPECT_FALSE(fs::exists(writable / "file"));
+}
+
+TEST_F(ShareGrants, letNothingBeMovedThatCannotBeRemoved) {
+    const auto locked = share("locked", {{"alice", write}});
+    const auto sticky = share("sticky", {{"alice", write}});
+    const auto writable = share("rw", {{"alice", write}});
+    fs::permissions(locked, fs::perms(0755));
+    fs::permissions(sticky, fs::perms(01777));
+    writeFile(sticky / "file", "sticky", bobId);
+    writeFile(sticky / "own", "own", aliceId);
+    fs::create_directory(sticky / "folder");
+    fs::permissions(sticky / "folder", fs::perms(0777));
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    for (const std::string from : {"/locked/file", "/sticky/file", "/sticky/folder"}) {
+        EXPECT_EQ(session.command("RNFR " + from).code, 350);
+        EXPECT_EQ(session.command("RNTO /rw/taken").code, 550) << from;
+        EXPECT_FALSE(fs::exists(writable / "taken")) << from;
+    }
+    EXPECT_TRUE(fs::is_directory(sticky / "folder"));
+    EXPECT_EQ(session.command("RNFR /sticky/own").code, 350);
+    EXPECT_EQ(session.command("RNTO /rw/taken").code, 250);
+    EXPECT_EQ(contentsOf(writable / "taken"), "own");
+    EXPECT_FALSE(fs::exists(sticky / "own"));
 }
 
 TEST_F(ShareGrants, holdThroughSymbolicLinks) {

@@ -4,6 +4,7 @@
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "tests/support/files.h"
 #include "tests/support/result.h"
 
 #include <crypt.h>
@@ -98,6 +99,21 @@ TEST_F(UnprivilegedFtp, servesTheAccountsOfItsOwnFiles) {
     const auto file = curl({"--ssl-reqd", "--cacert", (root_ / "var/lib/velt/tls/server.crt").string(),
                             "--user", "guest:guest-secret", "ftp://127.0.0.1:2121/home-of"});
     EXPECT_EQ(file.output, "carol") << file.errors;
+}
+
+TEST_F(UnprivilegedFtp, letsNobodyWriteWhatItsOwnUserObeys) {
+    const fs::path file = root_ / "etc/velt/ftp.passwd";
+    std::string accounts = contentsOf(file);
+    accounts.replace(accounts.find("/mnt/home/carol"), 15, "/mnt/srv");
+    writeFile(file, accounts, carolId);
+    record.user_chroot = 0;
+    startUnprivileged();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("guest"), 230);
+    EXPECT_EQ(session.send("STOR /mnt/home/carol/.profile", "x"), 550);
+    EXPECT_EQ(session.command("MKD /mnt/home/carol/.ssh").code, 550);
+    EXPECT_EQ(session.command("MKD /mnt/srv/.ssh").code, 550) << "of the account's home";
+    EXPECT_EQ(session.send("STOR /mnt/home/carol/file", "x"), 226);
 }
 
 TEST_F(UnprivilegedFtp, refusesLoginsThatItCannotConfine) {

@@ -135,12 +135,55 @@ TEST_F(LoginModule, letsNoFileRunWithItsOwnersRights) {
     EXPECT_EQ(modeOf(), 01640U);
 }
 
+TEST_F(LoginModule, opensFilesAsTheDaemonWould) {
+    ASSERT_EQ(logIn(script("")), login_granted);
+    const std::string file = folder_.write("file", "content").string();
+    std::filesystem::create_symlink("file", folder_.path() / "link");
+    std::filesystem::create_symlink("made", folder_.path() / "dangling");
+    std::filesystem::create_symlink("turn", folder_.path() / "turn");
+    const auto writes = [&](const std::string& name, int flags) {
+        const UniqueFd opened(open_as_the_daemon((folder_.path() / name).c_str(), flags));
+        return opened && write(opened.get(), "new", 3) == 3;
+    };
+    EXPECT_TRUE(writes("link", O_WRONLY | O_APPEND));
+    EXPECT_EQ(folder_.read("file"), "contentnew");
+    EXPECT_TRUE(writes("dangling", O_WRONLY | O_CREAT));
+    EXPECT_EQ(folder_.read("made"), "new");
+    EXPECT_FALSE(writes("file", O_RDONLY));
+    EXPECT_FALSE(writes("turn", O_WRONLY | O_CREAT));
+    EXPECT_EQ(errno, ELOOP);
+    EXPECT_FALSE(writes("absent", O_WRONLY));
+    EXPECT_EQ(errno, ENOENT);
+    EXPECT_FALSE(writes("file/below", O_WRONLY | O_CREAT));
+    EXPECT_EQ(errno, ENOTDIR);
+    EXPECT_FALSE(writes(std::string(PATH_MAX, 'x'), O_WRONLY | O_CREAT));
+    EXPECT_EQ(errno, ENAMETOOLONG);
+    EXPECT_EQ(cut_as_the_daemon((folder_.path() / "link").c_str(), 7), 0);
+    EXPECT_EQ(folder_.read("file"), "content");
+    EXPECT_EQ(move_as_the_daemon((folder_.path() / "link").c_str(), (folder_.path() / "moved").c_str()), 0);
+    EXPECT_TRUE(std::filesystem::is_symlink(folder_.path() / "moved"));
+}
+
+TEST_F(LoginModule, letsNobodyMakeLinks) {
+    ASSERT_EQ(logIn(script("")), login_granted);
+    const std::string file = folder_.write("file", "").string();
+    EXPECT_EQ(link_as_the_daemon(file.c_str(), (folder_.path() / "link").c_str()), -2);
+    EXPECT_EQ(errno, EPERM);
+    EXPECT_FALSE(std::filesystem::exists(folder_.path() / "link"));
+}
+
 TEST_F(LoginModule, leavesNoDescriptorBehind) {
     const auto count = [] { return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {}); };
     const auto before = count();
     logIn(script("exit 0\n"));
     logIn(script("exit 1\n"));
     logIn((folder_.path() / "absent").string());
+    ASSERT_EQ(logIn(script("")), login_granted);
+    const std::string file = folder_.write("file", "").string();
+    for (const std::string& path : {file, file + "/below", file + "/no/folder"}) {
+        change_mode_as_the_daemon(path.c_str(), 0777);
+        move_as_the_daemon(path.c_str(), path.c_str());
+    }
     EXPECT_EQ(count(), before);
 }
 

@@ -120,6 +120,23 @@ modret_t* mod_create_ret(cmd_rec* cmd, unsigned char code, const char* number, c
     return NULL;
 }
 
+void* get_param_ptr(xaset_t* set, const char* name, int recurse) {
+    (void)set;
+    (void)name;
+    (void)recurse;
+    return NULL;
+}
+
+int pr_netaddr_get_family(const pr_netaddr_t* address) {
+    (void)address;
+    return AF_INET;
+}
+
+void* pr_netaddr_get_inaddr(const pr_netaddr_t* address) {
+    (void)address;
+    return NULL;
+}
+
 unsigned char check_context(cmd_rec* cmd, int contexts) {
     (void)cmd;
     (void)contexts;
@@ -224,6 +241,25 @@ int change_mode_of_open_file_as_the_daemon(int descriptor, unsigned mode) {
     memset(&file, 0, sizeof(file));
     file.fh_fs = &files;
     return files.fchmod(&file, descriptor, (mode_t)mode);
+}
+
+int open_as_the_daemon(const char* path, int flags) {
+    pr_fh_t file;
+    memset(&file, 0, sizeof(file));
+    file.fh_fs = &files;
+    return files.open(&file, path, flags);
+}
+
+int cut_as_the_daemon(const char* path, long length) {
+    return files.truncate(&files, path, length);
+}
+
+int move_as_the_daemon(const char* from, const char* to) {
+    return files.rename(&files, from, to);
+}
+
+int link_as_the_daemon(const char* target, const char* path) {
+    return files.link(&files, target, path) + files.symlink(&files, target, path);
 }
 
 const char* logged(void) {

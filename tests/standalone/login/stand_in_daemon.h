@@ -26,6 +26,13 @@ enum login_end change_root_unasked(const struct login_world* world);
 int change_mode_as_the_daemon(const char* path, unsigned mode);
 int change_mode_of_open_file_as_the_daemon(int descriptor, unsigned mode);
 
+/* What the daemon's functions for files come to, after a login. As the system calls of these names; the last
+ * one tries both kinds of links, and gives the sum. */
+int open_as_the_daemon(const char* path, int flags);
+int cut_as_the_daemon(const char* path, long length);
+int move_as_the_daemon(const char* from, const char* to);
+int link_as_the_daemon(const char* target, const char* path);
+
 /* What the module wrote to the log in the last call; "" when nothing. */
 const char* logged(void);
 

@@ -77,6 +77,10 @@ bool DaemonProcess::start(const DaemonOrder& order) {
     return listens;
 }
 
+std::string DaemonProcess::output() {
+    return contentsOf(outputFile);
+}
+
 void DaemonProcess::stop() {
     if (pid_ > 0) {
         kill(pid_, SIGTERM);

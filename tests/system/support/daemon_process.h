@@ -6,6 +6,8 @@
 
 #include <sys/types.h>
 
+#include <string>
+
 namespace velt::test {
 
 class DaemonProcess {
@@ -23,6 +25,9 @@ public:
     void stop();
 
     pid_t pid() const { return pid_; }
+
+    /// What the last daemon has written to its outputs: its log.
+    static std::string output();
 
 private:
     pid_t pid_ = -1;

@@ -1,0 +1,116 @@
+// Which places a session may not change.
+#include "tests/support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+extern "C" {
+#include "standalone/login/own_files.h"
+#include "standalone/login/place.h"
+}
+
+#include <cerrno>
+#include <filesystem>
+#include <string>
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+class OwnFiles : public testing::Test {
+protected:
+    void TearDown() override { velt_forget_homes(); }
+
+    fs::path home() const { return folder_.path() / "home"; }
+    void keep() {
+        fs::create_directories(home());
+        ASSERT_EQ(velt_keep_home(home().c_str()), 0);
+    }
+    /// "" where the change is allowed.
+    static std::string refusal(const fs::path& path, velt_change change) {
+        velt_place place{};
+        if (velt_open_place(&place, path.c_str(), change) < 0) {
+            return errno == EACCES ? "kept" : std::to_string(errno);
+        }
+        velt_close_place(&place);
+        return "";
+    }
+    std::string content(const fs::path& path) { return refusal(home() / path, velt_changes_content); }
+    std::string name(const fs::path& path) { return refusal(home() / path, velt_changes_name); }
+
+    TemporaryFolder folder_;
+};
+
+TEST_F(OwnFiles, areKnownByName) {
+    keep();
+    for (const char* kept :
+         {".ssh", ".profile", ".Profile", ".qmail", ".qmail-x", ".forward", ".forwarder"}) {
+        EXPECT_EQ(content(kept), "kept") << kept;
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    for (const char* free : {"ssh", ".ssh2", ".sh", ".", "profile", ".profile~", ".qmai", "x.forward"}) {
+        EXPECT_EQ(content(free), "") << free;
+    }
+    EXPECT_EQ(refusal(folder_.path() / ".profile", velt_changes_name), "") << "no home";
+}
+
+TEST_F(OwnFiles, includeWhatLiesInThem) {
+    keep();
+    fs::create_directories(home() / ".config/deep/below");
+    fs::create_directories(home() / "other/.config");
+    EXPECT_EQ(content(".config/deep/below/file"), "kept") << "made after the login";
+    EXPECT_EQ(name("other/../.config/file"), "kept");
+    EXPECT_EQ(content("other/.config/file"), "");
+    EXPECT_EQ(content("other/absent/file"), std::to_string(ENOENT));
+}
+
+TEST_F(OwnFiles, areKnownBehindLinks) {
+    fs::create_directories(home() / "dots/ssh");
+    folder_.write("home/dots/rc", "");
+    fs::create_symlink(home() / "dots/rc", home() / ".bashrc");
+    fs::create_directory_symlink("way/ssh", home() / ".ssh");
+    fs::create_directory_symlink("dots", home() / "way");
+    fs::create_hard_link(home() / "dots/rc", home() / "twin");
+    fs::create_symlink(".profile", home() / "start");
+    fs::create_symlink("turn", home() / "turn");
+    keep();
+    for (const char* kept :
+         {"dots/rc", "way/rc", "twin", "start", "dots/ssh/keys", "way/ssh/keys", "dots/ssh"}) {
+        EXPECT_EQ(content(kept), "kept") << kept;
+    }
+    for (const char* kept : {"dots", "way", "dots/ssh", "."}) {
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    EXPECT_EQ(name("start"), "") << "the link is no such file";
+    EXPECT_EQ(content("dots/file"), "");
+    EXPECT_EQ(content("dots"), "") << "its mode";
+    EXPECT_EQ(content("turn"), std::to_string(ELOOP));
+}
+
+TEST_F(OwnFiles, areThoseOfALinkedHome) {
+    fs::create_directories(folder_.path() / "real/alice");
+    fs::create_directory_symlink("real", folder_.path() / "homes");
+    ASSERT_EQ(velt_keep_home((folder_.path() / "homes/alice").c_str()), 0);
+    EXPECT_EQ(refusal(folder_.path() / "real/alice/.bashrc", velt_changes_content), "kept");
+    for (const char* way : {"real", "homes", "real/alice"}) {
+        EXPECT_EQ(refusal(folder_.path() / way, velt_changes_name), "kept") << way;
+    }
+}
+
+TEST_F(OwnFiles, areNoneWithoutAHome) {
+    EXPECT_EQ(velt_keep_home((folder_.path() / "absent").c_str()), 0);
+    EXPECT_EQ(velt_keep_home((folder_.write("file", "") / "below").c_str()), 0);
+    EXPECT_EQ(refusal(folder_.path() / ".profile", velt_changes_name), "");
+    fs::create_directory_symlink("turn", folder_.path() / "turn");
+    EXPECT_EQ(velt_keep_home((folder_.path() / "turn").c_str()), -1);
+    EXPECT_EQ(velt_keep_home(std::string(PATH_MAX, 'x').c_str()), -1);
+}
+
+TEST_F(OwnFiles, areForgottenWithTheLogin) {
+    keep();
+    velt_forget_homes();
+    EXPECT_EQ(content(".profile"), "");
+    EXPECT_EQ(name("."), "");
+}
+
+} // namespace
+} // namespace velt::test

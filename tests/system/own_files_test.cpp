@@ -1,0 +1,186 @@
+// What nobody changes over FTP in a home of one's own: the files that log-ins, mail and shells obey.
+#include "tests/support/files.h"
+#include "tests/system/support/shared_folders.h"
+
+namespace velt::test {
+namespace {
+namespace fs = std::filesystem;
+
+const fs::path home = "/mnt/home/alice";
+
+class OwnFiles : public SharedFolders {
+protected:
+    void SetUp() override {
+        SharedFolders::SetUp();
+        record.user_chroot = 1;
+    }
+
+    static void makeFolder(const fs::path& folder) {
+        fs::create_directories(folder);
+        EXPECT_EQ(chown(folder.c_str(), aliceId, aliceId), 0);
+    }
+    /// Sends both names of a move; the code of the last answer.
+    static int move(FtpSession& session, const std::string& from, const std::string& to) {
+        const int known = session.command("RNFR " + from).code;
+        return known == 350 ? session.command("RNTO " + to).code : known;
+    }
+};
+
+TEST_F(OwnFiles, areNotMadeOverFtp) {
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    for (const std::string name : {".profile", ".bashrc", ".zshenv", ".forward", ".forward+list", ".rhosts",
+                                   ".qmail-all", ".k5login", ".BASHRC", ".pam_environment", ".ssh"}) {
+        EXPECT_EQ(session.send("STOR " + name, "x"), 550) << name;
+        EXPECT_EQ(session.send("APPE /" + name, "x"), 550) << name;
+        EXPECT_EQ(session.command("MKD " + name).code, 550) << name;
+        EXPECT_EQ(session.command("XMKD /" + name).code, 550) << name;
+        EXPECT_EQ(move(session, "home-of", name), 550) << name;
+        EXPECT_FALSE(fs::exists(home / name)) << name;
+    }
+    ASSERT_EQ(session.command("MKD prepared").code, 257);
+    ASSERT_EQ(session.send("STOR prepared/authorized_keys", "x"), 226);
+    EXPECT_EQ(move(session, "prepared", "./x/../.ssh"), 550);
+    EXPECT_EQ(move(session, "prepared", ".ssh"), 550);
+    EXPECT_EQ(move(session, "prepared", ".config"), 550);
+    EXPECT_FALSE(fs::exists(home / ".ssh"));
+    EXPECT_TRUE(fs::exists(home / "home-of"));
+}
+
+TEST_F(OwnFiles, areReadAndNotChanged) {
+    makeFolder(home / ".ssh/below");
+    makeFolder(home / ".ssh");
+    writeFile(home / ".ssh/authorized_keys", "key", aliceId);
+    writeFile(home / ".profile", "start", aliceId);
+    fs::create_directory_symlink(".ssh", home / "keys");
+    fs::create_directory_symlink("/.ssh/below", home / "deep");
+    fs::create_symlink(".profile", home / "starter");
+    fs::create_hard_link(home / ".profile", home / "twin");
+    fs::create_symlink(".bashrc", home / "dangling");
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.receive("RETR .ssh/authorized_keys"), "key");
+    EXPECT_EQ(session.receive("RETR keys/authorized_keys"), "key");
+    EXPECT_EQ(session.receive("RETR .profile"), "start");
+    EXPECT_EQ(session.receive("NLST .ssh"), ".ssh/authorized_keys\r\n.ssh/below\r\n");
+    for (const std::string path :
+         {".ssh/authorized_keys", ".ssh/new", ".ssh/below/new", "keys/authorized_keys", "keys/new",
+          "deep/new", ".profile", "starter", "twin", "dangling"}) {
+        EXPECT_EQ(session.send("STOR " + path, "x"), 550) << path;
+        EXPECT_EQ(session.send("APPE " + path, "x"), 550) << path;
+        session.command("REST 1");
+        EXPECT_EQ(session.send("STOR " + path, "x"), 550) << path;
+        EXPECT_GE(move(session, "home-of", path), path == "starter" || path == "dangling" ? 250 : 550)
+            << path;
+        writeFile(home / "home-of", "alice", aliceId);
+    }
+    for (const std::string path : {".ssh/authorized_keys", ".profile", ".ssh", "keys/authorized_keys"}) {
+        for (const std::string command : {"DELE ", "RMD ", "XRMD ", "SITE CHMOD 777 ", "MFMT 20200101000000 ",
+                                          "MFF Modify=20200101000000; ", "MFF UNIX.mode=777; ",
+                                          "SITE CHGRP 2001 ", "SITE UTIME 202001010000 "}) {
+            EXPECT_GE(session.command(command + path).code, 500) << command << path;
+        }
+        EXPECT_EQ(move(session, path, "away"), 550) << path;
+    }
+    for (const std::string folder : {".ssh", "/.ssh/below", "/keys"}) {
+        ASSERT_EQ(session.command("CWD " + folder).code, 250);
+        EXPECT_EQ(session.send("STOU", "x"), 550) << folder;
+        EXPECT_EQ(session.command("MKD new").code, 550) << folder;
+    }
+    EXPECT_EQ(contentsOf(home / ".ssh/authorized_keys"), "key");
+    EXPECT_EQ(contentsOf(home / ".profile"), "start");
+    EXPECT_FALSE(fs::exists(home / ".bashrc"));
+    EXPECT_EQ(std::distance(fs::directory_iterator(home / ".ssh"), {}), 2);
+    EXPECT_TRUE(fs::is_empty(home / ".ssh/below"));
+    EXPECT_EQ(modeOf(home / ".profile"), 0644U);
+    EXPECT_GT(fs::last_write_time(home / ".profile"),
+              fs::file_time_type::clock::now() - std::chrono::hours(1));
+}
+
+TEST_F(OwnFiles, leaveTheRestOfTheHomeAlone) {
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    for (const std::string name : {"profile", ".sshx", ".vimrc", "ssh", ".profiles"}) {
+        EXPECT_EQ(session.send("STOR " + name, "x"), 226) << name;
+        EXPECT_EQ(session.send("APPE " + name, "y"), 226) << name;
+        EXPECT_EQ(contentsOf(home / name), "xy") << name;
+        EXPECT_EQ(session.command("SITE CHMOD 600 " + name).code, 200) << name;
+        EXPECT_EQ(modeOf(home / name), 0600U) << name;
+        EXPECT_EQ(session.command("MFMT 20200101000000 " + name).code, 213) << name;
+        EXPECT_EQ(move(session, name, name + "2"), 250) << name;
+        EXPECT_EQ(session.command("DELE " + name + "2").code, 250) << name;
+    }
+    ASSERT_EQ(session.command("MKD site").code, 257);
+    EXPECT_EQ(session.send("STOR site/.profile", "x"), 226) << "only the home's own";
+    EXPECT_EQ(move(session, "site", "moved"), 250);
+    EXPECT_EQ(session.command("DELE moved/.profile").code, 250);
+    EXPECT_EQ(session.command("RMD moved").code, 250);
+    EXPECT_EQ(session.send("STOU", "x"), 226);
+    EXPECT_EQ(session.send("STOR home-of", "x"), 226);
+    EXPECT_EQ(contentsOf(home / "home-of"), "x");
+}
+
+TEST_F(OwnFiles, areKeptBehindLinks) {
+    makeFolder(home / "dots/ssh");
+    makeFolder(home / "dots");
+    writeFile(home / "dots/bashrc", "start", aliceId);
+    fs::create_symlink("dots/bashrc", home / ".bashrc");
+    fs::create_directory_symlink("way", home / ".ssh");
+    fs::create_directory_symlink("dots/ssh", home / "way");
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.send("STOR dots/bashrc", "x"), 550);
+    EXPECT_EQ(session.send("STOR dots/ssh/authorized_keys", "x"), 550);
+    EXPECT_EQ(session.send("STOR way/authorized_keys", "x"), 550);
+    EXPECT_EQ(session.command("DELE way").code, 550);
+    EXPECT_EQ(session.command("DELE dots/bashrc").code, 550);
+    EXPECT_EQ(move(session, "way", "away"), 550);
+    EXPECT_EQ(move(session, "dots", "away"), 550);
+    EXPECT_EQ(move(session, "home-of", "dots/bashrc"), 550);
+    EXPECT_EQ(session.send("STOR dots/other", "x"), 226);
+    EXPECT_EQ(contentsOf(home / "dots/bashrc"), "start");
+}
+
+TEST_F(OwnFiles, areKeptWhereAShareHoldsTheHome) {
+    const auto homes = share("homes", {{"alice", Access::write}}, {}, "/mnt/home");
+    share("rw", {{"alice", Access::write}});
+    makeFolder(home / ".config");
+    share("config", {{"alice", Access::write}}, {}, home / ".config");
+    record.user_chroot = 0;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.send("STOR /homes/alice/.bashrc", "x"), 550);
+    EXPECT_EQ(session.command("MKD /homes/alice/.ssh").code, 550);
+    EXPECT_EQ(move(session, "/rw/file", "/homes/alice/.bashrc"), 550);
+    EXPECT_EQ(session.send("STOR /config/new", "x"), 550);
+    EXPECT_EQ(session.command("MKD /config/new").code, 550);
+    EXPECT_EQ(move(session, "/homes/alice", "/homes/away"), 550);
+    EXPECT_EQ(session.command("RMD /homes/alice").code, 550);
+    EXPECT_EQ(session.send("STOR /homes/alice/new", "x"), 226);
+    EXPECT_EQ(session.send("STOR /homes/.bashrc", "x"), 226) << "no home";
+    EXPECT_EQ(session.send("STOR /rw/.bashrc", "x"), 226);
+    EXPECT_TRUE(fs::is_directory(home));
+    for (const char* made : {".bashrc", "file"}) {
+        fs::remove(homes / made);
+    }
+}
+
+TEST_F(OwnFiles, areThoseOfTheHomeOnly) {
+    const auto outer = share("outer", {{"alice", Access::write}});
+    makeFolder(home / ".ssh");
+    start();
+    storeRules({"u:1001:/outer"});
+    fs::create_directory_symlink("/mnt/home/alice/.ssh", outer / "out");
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.send("STOR .bashrc", "x"), 226) << "a rule leads elsewhere than home";
+    EXPECT_EQ(session.send("STOR out/authorized_keys", "x"), 550);
+}
+
+} // namespace
+} // namespace velt::test
