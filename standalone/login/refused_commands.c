@@ -1,6 +1,89 @@
 #include "standalone/login/refused_commands.h"
 
+#include "standalone/login/data_address.h"
 #include "standalone/login/place.h"
+
+/* Also in the form that UTF-8 gives to those above 0x7f. */
+static int has_control_characters(const char* text) {
+    for (const unsigned char* c = (const unsigned char*)text; *c != '\0'; c++) {
+        if (*c < 0x20 || *c == 0x7f || (c[0] == 0xc2 && c[1] >= 0x80 && c[1] < 0xa0)) {
+            return TRUE;
+        }
+    }
+    return FALSE;
+}
+
+/* The name that USER gave is refused when the daemon has prepared for the command. */
+static int name_is_refused = FALSE;
+
+static modret_t* refusal(cmd_rec* cmd) {
+    return PR_ERROR_MSG(cmd, R_501, "Control characters are not allowed here");
+}
+
+MODRET look_at_characters(cmd_rec* cmd) {
+    const unsigned char* authenticated = get_param_ptr(main_server->conf, "authenticated", FALSE);
+
+    name_is_refused = FALSE;
+    if (authenticated != NULL && *authenticated != FALSE) {
+        return PR_DECLINED(cmd);
+    }
+    /* A password is not logged, and may be anything. */
+    const char* argument = cmd->arg != NULL && strcmp(cmd->argv[0], C_PASS) != 0 ? cmd->arg : "";
+    if (!has_control_characters(cmd->argv[0]) && !has_control_characters(argument)) {
+        return PR_DECLINED(cmd);
+    }
+    if (strcmp(cmd->argv[0], C_USER) != 0) {
+        return refusal(cmd);
+    }
+    /* The daemon measures the time from its preparations for USER to the answer, to let all logins take the
+     * same time. Without the preparations it would learn nonsense. */
+    name_is_refused = TRUE;
+    cmd->arg = pstrdup(cmd->pool, "?");
+    return PR_DECLINED(cmd);
+}
+
+MODRET refuse_name(cmd_rec* cmd) {
+    return name_is_refused ? refusal(cmd) : PR_DECLINED(cmd);
+}
+
+static int is_same(const struct in6_addr* address, const pr_netaddr_t* other) {
+    const void* number = pr_netaddr_get_inaddr(other);
+
+    if (number == NULL) {
+        return FALSE;
+    }
+    if (pr_netaddr_get_family(other) == AF_INET6) {
+        return memcmp(address, number, sizeof(*address)) == 0;
+    }
+    return IN6_IS_ADDR_V4MAPPED(address) &&
+           memcmp(address->s6_addr + 12, number, sizeof(struct in_addr)) == 0;
+}
+
+/* Under which this server is known outside, if that is another than its own. */
+static int is_external(const struct in6_addr* address) {
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "MasqueradeAddress", FALSE);
+    return c != NULL && c->argv[0] != NULL && is_same(address, c->argv[0]);
+}
+
+MODRET refuse_data_to_the_inside(cmd_rec* cmd) {
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "AllowForeignAddress", FALSE);
+    struct in6_addr address;
+
+    /* Else the daemon takes no address but the client's own. */
+    if (c == NULL || *(const int*)c->argv[0] == FALSE || cmd->argc != 2) {
+        return PR_DECLINED(cmd);
+    }
+    int is_port = strcmp(cmd->argv[0], C_PORT) == 0;
+    if (!(is_port ? velt_read_port : velt_read_eprt)(cmd->argv[1], &address)) {
+        return PR_ERROR_MSG(cmd, R_501, "The address cannot be read");
+    }
+    if (is_same(&address, session.c->remote_addr) || !(is_external(&address) || velt_is_inside(&address))) {
+        return PR_DECLINED(cmd);
+    }
+    pr_log_pri(PR_LOG_WARNING, "refused %s %s: an address of this server or of no host",
+               (const char*)cmd->argv[0], (const char*)cmd->argv[1]);
+    return PR_ERROR_MSG(cmd, R_501, "No data may be sent to this address");
+}
 
 MODRET refuse_unique_name(cmd_rec* cmd) {
     struct velt_place place;
@@ -14,6 +97,10 @@ MODRET refuse_unique_name(cmd_rec* cmd) {
 }
 
 cmdtable velt_refused_commands[] = {
+    {PRE_CMD, C_ANY, G_NONE, look_at_characters, FALSE, FALSE, 0, NULL},
+    {CMD, C_ANY, G_NONE, refuse_name, FALSE, FALSE, 0, NULL},
+    {PRE_CMD, C_PORT, G_NONE, refuse_data_to_the_inside, TRUE, FALSE, 0, NULL},
+    {PRE_CMD, C_EPRT, G_NONE, refuse_data_to_the_inside, TRUE, FALSE, 0, NULL},
     {PRE_CMD, C_STOU, G_NONE, refuse_unique_name, TRUE, FALSE, 0, NULL},
     {0, NULL, NULL, NULL, FALSE, FALSE, 0, NULL},
 };

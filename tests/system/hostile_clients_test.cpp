@@ -47,6 +47,34 @@ TEST_F(FtpService, whoDoesNotLogInIsSentAway) {
     EXPECT_GT(secondsSince(begin), 25);
 }
 
+TEST_F(FtpService, strangersWriteNoControlCharactersToTheLog) {
+    offerTls(true);
+    start();
+    FtpSession session(port);
+    for (int i = 0; i < 2; i++) { // else it may wait for seconds, since it has not seen how long a name takes
+        EXPECT_EQ(session.command("USER alice").code, 331);
+    }
+    for (const std::string& command :
+         {std::string("USER a\x1b[31mb"), "USER " + std::string(300, '\x1b'), std::string("USER \x01"),
+          std::string("USER a\xc2\x9b") + "31m", std::string("USER a\x7f"), std::string("HOST \x1b"),
+          std::string("AUTH \x1b"), std::string("CLNT \x1b"), std::string("LANG \x1b"),
+          std::string("OPTS \x1b"), std::string("PBSZ \x1b"), std::string("PROT \x1b"),
+          std::string("CSID \x1b"), std::string("CWD \x1b"), std::string("RETR \x1b"),
+          std::string("\x1b command")}) {
+        EXPECT_EQ(session.command(command).code, 501) << command;
+    }
+    ASSERT_EQ(session.command("USER alice").code, 331);
+    EXPECT_EQ(session.command("PASS \x1b").code, 530);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.send("STOR odd\x1bname", "x"), 226) << "a file may have such a name";
+    EXPECT_EQ(FtpSession(port).logIn("mall\xc3\xb6ry"), 530);
+    const std::string log = DaemonProcess::output();
+    EXPECT_TRUE(contains(log, "mall")) << log;
+    for (const char* raw : {"\x1b", "\x01", "\x7f", "\xc2\x9b"}) {
+        EXPECT_FALSE(contains(log, raw)) << log;
+    }
+}
+
 TEST_F(FtpService, nobodyGetsSetUserIdFiles) {
     addShare("drop", "drop", Access::write);
     letAnonymousIn("drop");

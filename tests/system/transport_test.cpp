@@ -229,12 +229,41 @@ TEST_F(FtpService, fxpOnLetsDataGoElsewhere) {
     start();
     FtpSession session(port);
     ASSERT_EQ(session.logIn("alice"), 230);
-    EXPECT_EQ(session.command("PORT 127,0,0,2,200,1").code, 200);
+    EXPECT_EQ(session.command("PORT 198,51,100,9,200,1").code, 200);
     const auto address = session.passive();
     ASSERT_TRUE(address);
     const UniqueFd stranger = connectTo("127.0.0.1", address->port, "127.0.0.2");
     EXPECT_EQ(session.command("RETR home-of").code, 150);
     EXPECT_EQ(readToEnd(stranger.get()), "alice");
+}
+
+TEST_F(FtpService, fxpOnLetsNoDataGoToTheInside) {
+    for (const char* own : {"198.51.100.7/32", "2001:db8::7/128"}) {
+        ASSERT_EQ(runProcess({"ip", "address", "replace", own, "dev", "lo"}).exitCode, 0);
+    }
+    ASSERT_EQ(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
+    record.use_ext_ip = 1;
+    record.enable_fxp = 1;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    for (const char* address :
+         {"127,0,0,2", "127,255,255,255", "0,0,0,1", "169,254,1,1", "224,0,0,1", "255,255,255,255",
+          "198,51,100,7", "203,0,113,7", "4294967423,0,0,2", "+127,0,0,2", "0127,0,0,2"}) {
+        EXPECT_EQ(session.command(std::string("PORT ") + address + ",200,1").code, 501) << address;
+    }
+    for (const char* address :
+         {"|1|127.0.0.2|", "|1|169.254.1.1|", "|1|198.51.100.7|", "|2|::1|", "|2|::|", "|2|::ffff:127.0.0.2|",
+          "|2|::ffff:7f00:2|", "|2|::127.0.0.2|", "|2|::ffff:198.51.100.7|", "|2|2001:db8::7|", "|2|fe80::1|",
+          "|2|ff02::1|", "!1!127.0.0.2!", "|01|127.0.0.2|"}) {
+        EXPECT_EQ(session.command(std::string("EPRT ") + address + "51201|").code, 501) << address;
+    }
+    for (const char* command : {"PORT 127,0,0,1,200,1", "PORT 198,51,100,9,200,1", "EPRT |1|127.0.0.1|51201|",
+                                "EPRT |2|::ffff:127.0.0.1|51201|", "EPRT |2|2001:db8::9|51201|"}) {
+        EXPECT_EQ(session.command(command).code, 200) << command << ": the client's own, or another host's";
+    }
+    const auto file = curl({"--ftp-port", "::1", "--user", "alice:alice-secret", "ftp://[::1]:2121/home-of"});
+    EXPECT_EQ(file.output, "alice") << file.errors;
 }
 
 } // namespace
