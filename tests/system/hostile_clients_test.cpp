@@ -8,7 +8,9 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <filesystem>
+#include <vector>
 
 namespace velt::test {
 namespace {
@@ -72,6 +74,32 @@ TEST_F(FtpService, strangersWriteNoControlCharactersToTheLog) {
     EXPECT_TRUE(contains(log, "mall")) << log;
     for (const char* raw : {"\x1b", "\x01", "\x7f", "\xc2\x9b"}) {
         EXPECT_FALSE(contains(log, raw)) << log;
+    }
+}
+
+TEST_F(FtpService, whoIsLoggedInIsNobodyElsesBusiness) {
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    const auto run = worldRoot / "run/velt/ftp";
+    std::vector<std::string> found;
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(run)) {
+        if (entry.path().extension() != ".conf") {
+            found.push_back(entry.path());
+        }
+    }
+    const auto board = std::ranges::find_if(
+        found, [](const std::string& path) { return path.ends_with("proftpd.scoreboard"); });
+    ASSERT_NE(board, found.end());
+    const std::vector<std::string> list = {"ftpwho", "-f", *board};
+    EXPECT_TRUE(contains(runProcess(list).output, "alice")) << "root sees it";
+    for (const std::string& path : found) {
+        if (std::filesystem::is_regular_file(path)) {
+            EXPECT_NE(runProcess({"setpriv", "--reuid=1002", "--regid=1002", "--clear-groups", "cat", path})
+                          .exitCode,
+                      0)
+                << path;
+        }
     }
 }
 

@@ -94,6 +94,7 @@ TEST_F(UnprivilegedFtp, servesTheAccountsOfItsOwnFiles) {
     EXPECT_EQ(session.logIn("guest"), 230);
     EXPECT_EQ(session.receive("RETR home-of"), "carol");
     EXPECT_EQ(session.send("STOR sent", "x"), 226);
+    EXPECT_EQ(modeOf(root_ / "run/velt/ftp/daemon"), 0700U);
     EXPECT_EQ(FtpSession(port).logIn("guest", "wrong"), 530);
     EXPECT_EQ(FtpSession(port).logIn("alice"), 530) << "an account of the server";
     const auto file = curl({"--ssl-reqd", "--cacert", (root_ / "var/lib/velt/tls/server.crt").string(),

@@ -49,9 +49,9 @@ void renderServer(Text& text, const ProftpdPlaces& places) {
     text.line("ServerIdent on \"FTP server ready.\"");
     text.line("User", places.user);
     text.line("Group", places.group);
-    text.line("PidFile", places.runFolder / "proftpd.pid");
-    text.line("ScoreboardFile", places.runFolder / "proftpd.scoreboard");
-    text.line("DelayTable", places.runFolder / "proftpd.delay");
+    text.line("PidFile", places.runFolder / daemonFolder / "proftpd.pid");
+    text.line("ScoreboardFile", places.runFolder / daemonFolder / "proftpd.scoreboard");
+    text.line("DelayTable", places.runFolder / daemonFolder / "proftpd.delay");
     text.line("TransferLog none");
     text.line("WtmpLog off");
     text.line("UseReverseDNS off");

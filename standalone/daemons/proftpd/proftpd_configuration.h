@@ -16,11 +16,15 @@ struct AccountFiles {
     std::filesystem::path groups;
 };
 
+/// The folder in the run folder for the files that the daemon writes. They tell who is logged in, from where
+/// and what for, and the daemon lets everybody read them: nobody else may enter the folder.
+inline constexpr const char* daemonFolder = "daemon";
+
 /// What the configuration needs to know beside the settings. All of it is made by the platform; none of it is
 /// text that reached the platform through a request.
 struct ProftpdPlaces {
     std::filesystem::path moduleFolder; ///< holds mod_velt_login.so
-    std::filesystem::path runFolder;    ///< for the daemon's own run-time files
+    std::filesystem::path runFolder;    ///< for what is made at the daemon's start
     std::filesystem::path loginProgram; ///< velt-login-view
     std::filesystem::path stateRoot;
     std::filesystem::path loginRoot; ///< an empty folder, on which the program shows what a login may see

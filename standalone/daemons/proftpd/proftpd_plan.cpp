@@ -16,10 +16,17 @@ namespace {
 
 constexpr const char* program = "/usr/sbin/proftpd";
 
+Result<> makeDaemonFolder(const ProftpdPlaces& places) {
+    const auto folder = places.runFolder / daemonFolder;
+    VELT_RETURN_IF_ERROR(makeFolder(folder));
+    return ::chmod(folder.c_str(), 0700) == 0 ? Result<>() : cannot("make the folder", folder);
+}
+
 // The same text, but for the files that the daemon would write: its test writes some of them, too.
 Result<> testRendering(const FtpSettings& settings, ProftpdPlaces places) {
     VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
     places.runFolder = scratch.path();
+    VELT_RETURN_IF_ERROR(makeDaemonFolder(places));
     const auto configuration = scratch.path() / "proftpd.conf";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, renderProftpd(settings, places), 0600));
     return runConfigurationTest("FTP", {program, "-t", "-c", configuration.string()});
@@ -49,6 +56,7 @@ Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& pla
     for (const auto& folder : {places.runFolder, places.loginRoot, places.anonymousShare.parent_path()}) {
         VELT_RETURN_IF_ERROR(makePassableFolder(folder));
     }
+    VELT_RETURN_IF_ERROR(makeDaemonFolder(places));
     VELT_RETURN_IF_ERROR(makeRulesFile());
     return confinesAnonymous(settings)
                ? replaceFile(places.anonymousShare, settings.record.anonymous_chroot_share, 0600)
