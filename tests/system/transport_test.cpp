@@ -3,7 +3,9 @@
 
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
+#include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "tests/support/files.h"
+#include "tests/support/result.h"
 #include "tests/support/text.h"
 #include <cstring>
 
@@ -141,6 +143,8 @@ TEST_F(FtpService, certificateOfTheAdministratorIsServed) {
                             "alice:alice-secret", "ftp://127.0.0.1:2121/home-of"});
     EXPECT_EQ(file.exitCode, 0) << file.errors;
     EXPECT_EQ(file.output, "alice");
+    std::filesystem::permissions(folder / "server.key", std::filesystem::perms(0644));
+    EXPECT_TRUE(contains(messageOf(planFtpDaemon()), "server.key is open to other users"));
 }
 
 TEST_F(FtpService, controlPortFollowsTheSetting) {

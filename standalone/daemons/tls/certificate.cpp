@@ -13,6 +13,8 @@
 
 #include <openssl/err.h>
 #include <openssl/pem.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 namespace velt {
 namespace {
@@ -74,6 +76,27 @@ Result<ServerCertificate> load(const Pair& pair) {
                              sha256(*certificateText + *keyText), nullptr};
 }
 
+// Whoever reads the key can pass for this server, and whoever writes it decides who can.
+Result<> checkPrivate(const std::filesystem::path& key) {
+    struct stat facts {};
+    if (::stat(key.c_str(), &facts) != 0) {
+        return refuse(key, "cannot be read");
+    }
+    if (facts.st_uid != 0 && facts.st_uid != geteuid()) {
+        return refuse(key, "belongs to another user; mend it with: chown root " + key.string());
+    }
+    if ((facts.st_mode & (S_IRWXO | S_IWGRP)) != 0) {
+        return refuse(key, "is open to other users; mend it with: chmod 640 " + key.string());
+    }
+    return {};
+}
+
+Result<ServerCertificate> loadGiven(const Pair& pair) {
+    VELT_ASSIGN_OR_RETURN(auto certificate, load(pair));
+    VELT_RETURN_IF_ERROR(checkPrivate(pair.key));
+    return certificate;
+}
+
 // A crash between the two writes of a renewal leaves an old certificate with a new key, which is not usable
 // either.
 bool isUsable(const Pair& pair) {
@@ -111,7 +134,7 @@ Result<ServerCertificate> throwAway() {
 Result<ServerCertificate> serverCertificate() {
     const Pair given{statePath(paths::givenCertificate), statePath(paths::givenKey)};
     if (fileExists(given.certificate) || fileExists(given.key)) {
-        return load(given);
+        return loadGiven(given);
     }
     const Pair own{statePath(paths::ownCertificate), statePath(paths::ownKey)};
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());

@@ -61,7 +61,8 @@ protected:
 
     void give(const SelfSigned& pair) {
         root_.write("etc/velt/tls/server.crt", pair.certificate);
-        root_.write("etc/velt/tls/server.key", pair.key);
+        const auto key = root_.write("etc/velt/tls/server.key", pair.key);
+        EXPECT_EQ(chmod(key.c_str(), 0600), 0);
     }
     static void expectRefusal(const std::string& part) {
         const std::string refusal = messageOf(serverCertificate());
@@ -128,6 +129,24 @@ TEST_F(ServerCertificates, ofTheAdministratorAreNeverReplacedByOwnOnes) {
     expectRefusal("server.key does not match the certificate");
     root_.write("etc/velt/tls/server.crt", "nonsense");
     expectRefusal("server.crt does not contain a PEM certificate");
+}
+
+TEST_F(ServerCertificates, withAKeyThatOthersMayReadAreRefused) {
+    give(*makeSelfSigned({"given", {}}));
+    const std::string key = root_.path() / "etc/velt/tls/server.key";
+    for (const unsigned mode : {0600U, 0400U, 0640U, 0440U}) {
+        EXPECT_EQ(chmod(key.c_str(), mode), 0);
+        EXPECT_EQ(messageOf(serverCertificate()), "") << std::oct << mode;
+    }
+    for (const unsigned mode : {0644U, 0604U, 0602U, 0601U, 0660U, 0620U}) {
+        EXPECT_EQ(chmod(key.c_str(), mode), 0);
+        expectRefusal(key + " is open to other users; mend it with: chmod 640 " + key + ".");
+    }
+    EXPECT_EQ(chmod(key.c_str(), 0600), 0);
+    if (geteuid() == 0) {
+        EXPECT_EQ(chown(key.c_str(), 65534, 0), 0);
+        expectRefusal("belongs to another user; mend it with: chown root " + key);
+    }
 }
 
 TEST_F(ServerCertificates, withAKeyThatAsksForAPassphraseAreRefused) {
