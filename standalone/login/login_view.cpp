@@ -10,6 +10,8 @@
 #include "standalone/rules/rule_store.h"
 #include "standalone/shares/share_file.h"
 
+#include <strings.h>
+
 #include <algorithm>
 #include <optional>
 
@@ -38,6 +40,11 @@ Result<std::optional<std::string>> readRule(const Identity& user) {
     VELT_ASSIGN_OR_RETURN(const auto rules, parseRules(text));
     const ChrootRule* const rule = ruleFor(rules, user.uid, user.gids);
     return rule != nullptr ? std::optional(rule->path) : std::nullopt;
+}
+
+// In its root directory the daemon's module lets nobody change these folders, see own_files.h.
+bool isKeptInRoot(const std::string& share) {
+    return strcasecmp(share.c_str(), "etc") == 0 || strcasecmp(share.c_str(), "lib") == 0;
 }
 
 class ViewMaker {
@@ -118,6 +125,11 @@ Result<> ViewMaker::showInShare(const std::string& path) {
 Result<> ViewMaker::addShare(SideBySide& view, const ShareEntry& share, Access access) {
     VELT_ASSIGN_OR_RETURN(auto folder, openFolderAs(login_.user, share.path));
     access = limitedByMissing(folder.place, access);
+    if (isKeptInRoot(share.name) && access == Access::write) {
+        remarks.push_back("The share " + share.name +
+                          " is read-only over FTP, since system folders have this name.");
+        access = Access::read;
+    }
     return view.add(share.name, visible(std::move(folder), access));
 }
 

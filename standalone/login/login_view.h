@@ -29,8 +29,8 @@ struct Login {
 
 /// Makes `root`, an existing folder, show what the login may see: the folder of the user's chroot rule, else
 /// the default view, with the access that the shares grant. It mounts in this process's mount namespace,
-/// which must belong to the session alone. Returns one sentence for each share that is left out. After an
-/// error the login must be refused.
+/// which must belong to the session alone. Returns one sentence for each share that is left out or
+/// gives less than it grants. After an error the login must be refused.
 Result<std::vector<std::string>> makeLoginView(const Login& login, const std::filesystem::path& root);
 
 } // namespace velt

@@ -29,8 +29,9 @@ UniqueFd mountOf(const UniqueFd& folder, Access access) {
     UniqueFd tree(
         open_tree(folder.get(), "", OPEN_TREE_CLONE | OPEN_TREE_CLOEXEC | AT_EMPTY_PATH | AT_RECURSIVE));
     mount_attr attributes{};
-    attributes.attr_set =
-        MOUNT_ATTR_NOSUID | MOUNT_ATTR_NODEV | (access == Access::write ? 0U : MOUNT_ATTR_RDONLY);
+    // Not executable: the daemon, which can get root's rights back, must not load a library from there.
+    attributes.attr_set = MOUNT_ATTR_NOSUID | MOUNT_ATTR_NODEV | MOUNT_ATTR_NOEXEC |
+                          (access == Access::write ? 0U : MOUNT_ATTR_RDONLY);
     attributes.propagation = MS_PRIVATE;
     if (!tree ||
         mount_setattr(tree.get(), "", AT_EMPTY_PATH | AT_RECURSIVE, &attributes, sizeof attributes) != 0) {
@@ -131,7 +132,7 @@ Result<> SideBySide::finish() {
         return Error(ErrorNumber::daemon, "Cannot remove a share that could not be restricted.");
     }
     return outcome(mount(nullptr, root_.c_str(), nullptr,
-                         MS_REMOUNT | MS_BIND | MS_RDONLY | MS_NOSUID | MS_NODEV, nullptr) == 0,
+                         MS_REMOUNT | MS_BIND | MS_RDONLY | MS_NOSUID | MS_NODEV | MS_NOEXEC, nullptr) == 0,
                    "Cannot make the folder of the shares read-only");
 }
 

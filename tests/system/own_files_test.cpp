@@ -1,5 +1,6 @@
-// What nobody changes over FTP in a home of one's own: the files that log-ins, mail and shells obey.
+// What nobody changes over FTP: the files of a home that log-ins, mail and shells obey, and system folders.
 #include "tests/support/files.h"
+#include "tests/support/text.h"
 #include "tests/system/support/shared_folders.h"
 
 namespace velt::test {
@@ -180,6 +181,44 @@ TEST_F(OwnFiles, areThoseOfTheHomeOnly) {
     ASSERT_EQ(session.logIn("alice"), 230);
     EXPECT_EQ(session.send("STOR .bashrc", "x"), 226) << "a rule leads elsewhere than home";
     EXPECT_EQ(session.send("STOR out/authorized_keys", "x"), 550);
+}
+
+TEST_F(OwnFiles, includeTheSystemFoldersOfASessionsRoot) {
+    for (const char* name : {"etc", "lib", "usr", "etcetera"}) {
+        fs::create_directory(share(name, {{"alice", Access::write}}) / "etc");
+        fs::permissions(fs::path("/mnt/srv") / name / "etc", fs::perms(0777));
+    }
+    record.user_chroot = 0;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    for (const std::string name : {"/etc", "/lib"}) {
+        EXPECT_EQ(session.receive("RETR " + name + "/file"), name.substr(1));
+        ASSERT_EQ(session.command("CWD " + name).code, 250);
+        for (const char* command : {"STOR file", "STOR etc/new", "APPE file", "STOU"}) {
+            EXPECT_GE(session.send(command, "x"), 450) << name << command;
+        }
+        for (const std::string command : {"MKD made", "DELE file", "RMD etc", "SITE CHMOD 600 file"}) {
+            EXPECT_EQ(session.command(command).code, 550) << name << command;
+        }
+        EXPECT_EQ(std::distance(fs::directory_iterator("/mnt/srv" + name), {}), 2);
+        EXPECT_TRUE(
+            contains(DaemonProcess::output(), "The share " + name.substr(1) + " is read-only over FTP"))
+            << name;
+    }
+    EXPECT_EQ(session.send("STOR /usr/etc/new", "x"), 226);
+    EXPECT_EQ(session.send("STOR /etcetera/etc/new", "x"), 226);
+    record.user_chroot = 1;
+    start();
+    fs::create_directory("/mnt/home/alice/lib");
+    EXPECT_EQ(chown("/mnt/home/alice/lib", aliceId, aliceId), 0);
+    FtpSession confined(port);
+    ASSERT_EQ(confined.logIn("alice"), 230);
+    EXPECT_EQ(confined.command("MKD etc").code, 550);
+    EXPECT_EQ(confined.send("STOR lib/libnss.so", "x"), 550);
+    ASSERT_EQ(confined.command("CWD lib").code, 250);
+    EXPECT_EQ(confined.send("STOU", "x"), 550);
+    EXPECT_TRUE(fs::is_empty("/mnt/home/alice/lib"));
 }
 
 } // namespace

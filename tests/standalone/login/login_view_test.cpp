@@ -74,6 +74,29 @@ TEST_F(LoginView, hasTheSharesThatTheUserMayRead) {
     EXPECT_FALSE(fs::exists(view_ / "gone"));
 }
 
+TEST_F(LoginView, givesNoMoreThanReadingWhereTheDaemonNeverWrites) {
+    std::vector<ShareEntry> shares;
+    for (const char* name : {"etc", "Lib", "lib64"}) {
+        const fs::path folder = root_.path() / name;
+        fs::create_directory(folder);
+        fs::permissions(folder, fs::perms(0777));
+        shares.push_back({name, "", folder, true, {{"ann", Access::write}}, {}});
+    }
+    ASSERT_EQ(messageOf(storeShares(shares)), "");
+    login_.view = DefaultView::shares;
+    const auto remarks = makeLoginView(login_, view_);
+    ASSERT_TRUE(remarks) << messageOf(remarks);
+    EXPECT_EQ(*remarks, (std::vector<std::string>{
+                            "The share etc is read-only over FTP, since system folders have this name.",
+                            "The share Lib is read-only over FTP, since system folders have this name."}));
+    const auto isReadOnly = [&](const char* share) {
+        return mkdir((view_ / share / "made").c_str(), 0755) < 0 && errno == EROFS;
+    };
+    EXPECT_TRUE(isReadOnly("etc"));
+    EXPECT_TRUE(isReadOnly("Lib"));
+    EXPECT_FALSE(isReadOnly("lib64"));
+}
+
 TEST_F(LoginView, leavesOutAShareThatCannotBeShown) {
     const fs::path stubborn = root_.path() / "share";
     ASSERT_EQ(mount("disk", stubborn.c_str(), "tmpfs", 0, "mode=0755"), 0);

@@ -10,6 +10,7 @@
 #include <fcntl.h>
 #include <sched.h>
 #include <sys/mount.h>
+#include <sys/statvfs.h>
 
 #include <cerrno>
 #include <cstring>
@@ -72,6 +73,25 @@ TEST_F(ViewMounts, forWritingAreWritable) {
     EXPECT_EQ(whyNotWritable(view_), "");
     EXPECT_EQ(whyNotWritable(view_ / "disk"), "");
     EXPECT_TRUE(fs::exists(share_ / "new"));
+}
+
+TEST_F(ViewMounts, letNothingBeExecuted) {
+    const auto mayExecute = [](const fs::path& place) {
+        struct statvfs facts {};
+        return statvfs(place.c_str(), &facts) != 0 || (facts.f_flag & ST_NOEXEC) == 0;
+    };
+    ASSERT_EQ(messageOf(showFolder(view_, share(Access::write, {{"inner", Access::read}}))), "");
+    for (const char* place : {"", "disk", "inner"}) {
+        EXPECT_FALSE(mayExecute(view_ / place)) << place;
+    }
+    SideBySide view(view_);
+    ASSERT_EQ(messageOf(view.begin()), "");
+    ASSERT_EQ(messageOf(view.add("share", share(Access::write))), "");
+    ASSERT_EQ(messageOf(view.finish()), "");
+    for (const char* place : {"", "share", "share/disk"}) {
+        EXPECT_FALSE(mayExecute(view_ / place)) << place;
+    }
+    EXPECT_TRUE(mayExecute(share_)) << "the server's own mount does not change";
 }
 
 TEST_F(ViewMounts, doNotFollowWhatIsMountedLater) {
