@@ -36,6 +36,28 @@ Grants::Grants(const Identity& user, const std::vector<ShareEntry>& shares) {
         known_.push_back({&share, place, found, toldOf(user, share), keyOf(place)});
     }
     std::ranges::stable_sort(known_, {}, &Known::key);
+    limitAroundMissing();
+}
+
+void Grants::limitAroundMissing() {
+    std::vector<Known*> limited;
+    for (Known& outer : known_) {
+        const Range below = strictlyBelow(outer.place);
+        if (outer.told == Access::write && !std::ranges::all_of(below, &Known::found)) {
+            limited.push_back(&outer);
+        }
+    }
+    for (const Known& known : known_) {
+        const auto isAround = [&known](const Known* outer) {
+            return outer->key != known.key && known.key.starts_with(outer->key);
+        };
+        if (!known.found && std::ranges::any_of(limited, isAround)) {
+            missing_.push_back(known.share->name);
+        }
+    }
+    for (Known* const outer : limited) {
+        outer->told = Access::read;
+    }
 }
 
 Grants::Range Grants::at(const std::string& key) const {
@@ -98,16 +120,6 @@ std::vector<Restriction> Grants::restrictionsBelow(const std::filesystem::path& 
         all.push_back({folder, granted});
     }
     return all;
-}
-
-std::vector<std::string> Grants::missingBelow(const std::filesystem::path& place) const {
-    std::vector<std::string> names;
-    for (const Known& known : strictlyBelow(place)) {
-        if (!known.found) {
-            names.push_back(known.share->name);
-        }
-    }
-    return names;
 }
 
 } // namespace velt

@@ -33,9 +33,10 @@ public:
     /// removed, whoever the user is.
     std::vector<Restriction> restrictionsBelow(const std::filesystem::path& place, Access access) const;
 
-    /// The shares below `place` whose folders are missing. Somebody who may write there could put another
-    /// folder in the place of one, and the right one, wherever it is now, has no restrictions.
-    std::vector<std::string> missingBelow(const std::filesystem::path& place) const;
+    /// The shares whose folders are missing and around which the user could otherwise write. Somebody who may
+    /// write there could put another folder in the place of one, and the right one, wherever it is now, has
+    /// no restrictions; so the shares around them grant at most reading.
+    const std::vector<std::string>& missing() const { return missing_; }
 
 private:
     struct Known {
@@ -52,8 +53,10 @@ private:
     Range strictlyBelow(const std::filesystem::path& place) const;
     /// Calls `visit` for those at the place and around it, outer ones first.
     template<class Visit> void around(const std::filesystem::path& place, const Visit& visit) const;
+    void limitAroundMissing();
 
     std::vector<Known> known_; ///< by key
+    std::vector<std::string> missing_;
 };
 
 } // namespace velt

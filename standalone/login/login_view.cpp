@@ -50,7 +50,12 @@ bool isKeptInRoot(const std::string& share) {
 class ViewMaker {
 public:
     ViewMaker(const Login& login, const std::filesystem::path& root, const std::vector<ShareEntry>& shares)
-        : login_(login), root_(root), shares_(shares), grants_(login.user, shares) {}
+        : login_(login), root_(root), shares_(shares), grants_(login.user, shares) {
+        for (const std::string& share : grants_.missing()) {
+            remarks.push_back("The folder of the share " + share +
+                              " is missing; until it is back, nobody writes to the shares around it.");
+        }
+    }
 
     Result<> showHome();
     /// Shows the folder "/share/below/it".
@@ -61,8 +66,6 @@ public:
     std::vector<std::string> remarks;
 
 private:
-    /// The access, at most reading while the folder of a share below the place is missing.
-    Access limitedByMissing(const std::filesystem::path& place, Access access);
     /// The folder with this access, and what the shares in it need.
     VisibleFolder visible(OpenedFolder folder, Access access);
     /// Shows the folder with this access, limited by the shares between it and `outer`.
@@ -74,15 +77,6 @@ private:
     const std::vector<ShareEntry>& shares_;
     Grants grants_;
 };
-
-Access ViewMaker::limitedByMissing(const std::filesystem::path& place, Access access) {
-    for (const std::string& share : grants_.missingBelow(place)) {
-        remarks.push_back("The folder of the share " + share +
-                          " is missing; until it is back, nobody writes to " + place.string() + ".");
-        access = std::min(access, Access::read);
-    }
-    return access;
-}
 
 VisibleFolder ViewMaker::visible(OpenedFolder folder, Access access) {
     return {std::move(folder.fd), access, grants_.restrictionsBelow(folder.place, access)};
@@ -118,13 +112,11 @@ Result<> ViewMaker::showInShare(const std::string& path) {
     if (end < path.size()) {
         VELT_ASSIGN_OR_RETURN(folder, openFolderBelow(login_.user, folder.fd, path.substr(end + 1)));
     }
-    const Access limited = limitedByMissing(folder.place, access);
-    return showOne(std::move(folder), outer, limited);
+    return showOne(std::move(folder), outer, access);
 }
 
 Result<> ViewMaker::addShare(SideBySide& view, const ShareEntry& share, Access access) {
     VELT_ASSIGN_OR_RETURN(auto folder, openFolderAs(login_.user, share.path));
-    access = limitedByMissing(folder.place, access);
     if (isKeptInRoot(share.name) && access == Access::write) {
         remarks.push_back("The share " + share.name +
                           " is read-only over FTP, since system folders have this name.");

@@ -108,17 +108,35 @@ TEST_F(GrantsTest, areAskedWithoutAProcessForEach) {
     EXPECT_EQ(usedByChildren(), before);
 }
 
-TEST_F(GrantsTest, tellWhichFoldersAreMissing) {
+TEST_F(GrantsTest, letNobodyWriteAroundAMissingFolder) {
     share("outer", Access::write);
     share("outer/absent", Access::none);
     share("outer/inner", Access::write);
     fs::create_directory_symlink("inner", top_ / "outer/link");
     share("outer/link/below", Access::write);
     const Grants grants(user_, shares_);
-    EXPECT_EQ(grants.missingBelow(top_ / "outer"), (std::vector<std::string>{"s1", "s3"}))
-        << "anybody may have made the link";
-    EXPECT_EQ(grants.missingBelow(top_ / "outer/inner"), std::vector<std::string>());
-    EXPECT_EQ(restrictionsBelow("outer"), "inner write");
+    EXPECT_EQ(grants.missing(), (std::vector<std::string>{"s1", "s3"})) << "anybody may have made the link";
+    EXPECT_EQ(grants.on(shares_[0]), Access::read);
+    EXPECT_EQ(grants.on(shares_[2]), Access::read) << "it lies in the one that misses them";
+    fs::create_directory(top_ / "outer/absent");
+    fs::remove(top_ / "outer/link");
+    fs::create_directories(top_ / "outer/link/below");
+    EXPECT_EQ(Grants(user_, shares_).missing(), std::vector<std::string>());
+    EXPECT_EQ(Grants(user_, shares_).on(shares_[0]), Access::write);
+}
+
+TEST_F(GrantsTest, letNobodyWriteAtHomeToAShareThatMissesOne) {
+    share("outer/inner", Access::write);
+    share("outer/inner/absent", Access::write);
+    EXPECT_EQ(restrictionsBelow("outer"), "inner read");
+    const Grants grants(user_, shares_);
+    EXPECT_EQ(grants.leastAt(top_ / "outer/inner", top_ / "outer", Access::write), Access::read);
+}
+
+TEST_F(GrantsTest, sayNothingOfAMissingFolderWhereTheUserOnlyReads) {
+    share("outer", Access::read);
+    share("outer/absent", Access::write);
+    EXPECT_EQ(Grants(user_, shares_).missing(), std::vector<std::string>());
 }
 
 TEST_F(GrantsTest, holdWhereALinkLeadsToTheShare) {
