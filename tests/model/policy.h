@@ -1,0 +1,79 @@
+// The model of access: what the documented rules give each login. Written from docs/confinement.md, not from
+// the code that it judges.
+#ifndef VELT_TESTS_MODEL_POLICY_H
+#define VELT_TESTS_MODEL_POLICY_H
+
+#include "tests/model/tree.h"
+
+namespace velt::model {
+
+enum class Access {
+    none,
+    read,
+    write,
+};
+
+struct Share {
+    std::string name;
+    std::string path;
+    bool offered = true;
+    std::map<std::string, Access> users;
+    std::map<std::string, Access> groups;
+};
+
+struct Rule {
+    std::string who; ///< "alice" or "@staff"
+    std::string path;
+};
+
+struct Switches {
+    bool confined = false;   ///< users without a rule see their homes, else the shares
+    bool anonymous = false;  ///< anonymous users are let in
+    std::string guestsShare; ///< what they see; "": the shares
+};
+
+/// All that decides what a login may do.
+struct World {
+    Tree tree;
+    std::vector<Share> shares;
+    std::vector<Rule> rules;
+    Switches switches;
+};
+
+/// "ftp" is the account of anonymous users.
+const std::vector<Account>& accounts();
+const Account& accountOf(const std::string& name);
+/// Nothing when there is no such group.
+std::optional<unsigned> groupNumber(const std::string& name);
+
+/// A mounted folder of a view.
+struct Mount {
+    int parent = -1;        ///< the mount in which it lies; -1: the view's root
+    std::uint64_t over = 0; ///< the folder there that it covers; 0 in the root
+    std::string name;       ///< in a root that shows several shares side by side; else ""
+    std::uint64_t folder = 0;
+    Access access = Access::none; ///< none: it looks empty and cannot be entered
+};
+
+/// What a share, or the home, gave the user when he logged in.
+struct Limit {
+    std::uint64_t folder = 0;
+    Access access = Access::none;
+};
+
+struct View {
+    bool sideBySide = false;
+    std::vector<Mount> mounts; ///< the root first, unless several folders stand side by side
+    std::vector<Limit> limits; ///< whatever the mounts are: see mayReach
+};
+
+/// Nothing when the login is refused.
+std::optional<View> viewOf(const World& world, const Account& account);
+
+/// Whether such a view may ever lead to this place with this access, whatever was done since: the innermost
+/// share or home around it must have given that much. Says less than the mounts do, and depends on less.
+bool mayReach(const Tree& tree, const View& view, const std::string& place, Access access);
+
+} // namespace velt::model
+
+#endif

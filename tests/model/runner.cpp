@@ -1,0 +1,190 @@
+#include "tests/model/runner.h"
+
+#include "tests/model/comparison.h"
+
+#include <algorithm>
+#include <exception>
+
+namespace velt::model {
+namespace {
+
+Access accessNamed(const std::string& word) {
+    return word == "write" ? Access::write : word == "read" ? Access::read : Access::none;
+}
+
+Listing listingNamed(const std::string& verb) {
+    return verb == "list" ? Listing::list : verb == "names" ? Listing::names : Listing::facts;
+}
+
+Outcome doStep(Client& client, const Step& step, const std::string& data) {
+    const std::string& verb = step[0];
+    const std::string& path = step.at(2);
+    Outcome outcome;
+    if (verb == "list" || verb == "names" || verb == "facts") {
+        outcome.names = client.list(path, listingNamed(verb));
+        outcome.allowed = outcome.names.has_value();
+    } else if (verb == "read") {
+        outcome.content = client.read(path);
+        outcome.allowed = outcome.content.has_value();
+    } else {
+        outcome.allowed = verb == "enter"           ? client.enter(path)
+                          : verb == "write"         ? client.write(path, data)
+                          : verb == "append"        ? client.append(path, data)
+                          : verb == "make"          ? client.make(path)
+                          : verb == "remove"        ? client.remove(path)
+                          : verb == "remove-folder" ? client.removeFolder(path)
+                          : verb == "rename"        ? client.rename(path, step.at(3))
+                                                    : client.changeMode(path, step.at(3));
+    }
+    return outcome;
+}
+
+} // namespace
+
+void Runner::begin() {
+    sessions_.clear();
+    ended_.clear();
+    real_.clear();
+    world_ = {};
+    world_.switches = possibleSwitches().front();
+    world_.tree = real_.look();
+}
+
+std::string Runner::perform(const Step& step) {
+    const std::string& verb = step.at(0);
+    counts_.steps++;
+    if (verb == "login") {
+        return logIn(step);
+    }
+    const auto session = step.size() > 1 ? sessions_.find(step[1]) : sessions_.end();
+    if (verb == "logout") {
+        logOut(step.at(1));
+        return "";
+    }
+    return session != sessions_.end() ? ask(step, session->second) : administer(step);
+}
+
+std::string Runner::administer(const Step& step) {
+    const std::string& verb = step[0];
+    const std::string data = "#" + std::to_string(++written_) + ";";
+    if (verb == "folder" || verb == "file" || verb == "link") {
+        real_.layDown(step, data);
+    } else if (verb == "shell") {
+        real_.inShell(step, data);
+    } else if (verb == "share") {
+        setShare(step);
+    } else if (verb == "unshare") {
+        std::erase_if(world_.shares, [&](const Share& share) { return share.name == step.at(1); });
+        real_.storeShares(world_.shares);
+    } else if (verb == "rules") {
+        setRules(step);
+    } else if (verb == "switches") {
+        const auto [guests, share] = splitPair(step.at(2));
+        world_.switches = {step.at(1) == "home", guests == "guests", share};
+    }
+    world_.tree = real_.look();
+    return "";
+}
+
+void Runner::setShare(const Step& step) {
+    Share share{step.at(1), step.at(2), true, {}, {}};
+    for (std::size_t i = 3; i < step.size(); i++) {
+        const auto [who, access] = splitPair(step[i]);
+        if (step[i] == "hidden") {
+            share.offered = false;
+        } else if (who.starts_with('@')) {
+            share.groups[who.substr(1)] = accessNamed(access);
+        } else {
+            share.users[who] = accessNamed(access);
+        }
+    }
+    std::erase_if(world_.shares, [&](const Share& one) { return one.name == share.name; });
+    world_.shares.push_back(std::move(share));
+    real_.storeShares(world_.shares);
+}
+
+void Runner::setRules(const Step& step) {
+    world_.rules.clear();
+    for (std::size_t i = 1; i < step.size(); i++) {
+        const auto [who, path] = splitPair(step[i]);
+        world_.rules.push_back({who, path});
+    }
+    real_.storeRules(world_.rules);
+}
+
+std::string Runner::logIn(const Step& step) {
+    const Account& account = accountOf(step.at(2));
+    counts_.logins++;
+    logOut(step[1]);
+    auto view = viewOf(world_, account);
+    auto client = real_.logIn(world_.switches, account);
+    if (view.has_value() != client->isLoggedIn()) {
+        return view ? "was refused, and must be allowed" : "was allowed, and must be refused";
+    }
+    if (view) {
+        sessions_.emplace(step[1], Session{account, std::move(*view), std::move(client)});
+    } else {
+        ended_.push_back(std::move(client));
+    }
+    return "";
+}
+
+void Runner::logOut(const std::string& session) {
+    if (const auto found = sessions_.find(session); found != sessions_.end()) {
+        ended_.push_back(std::move(found->second.client));
+        sessions_.erase(found);
+    }
+}
+
+std::string Runner::ask(const Step& step, Session& session) {
+    const std::string data = "#" + std::to_string(++written_) + ";";
+    const Expectation expected = expect(world_.tree, session.view, session.account, step, data);
+    Outcome outcome;
+    try {
+        outcome = doStep(*session.client, step, data);
+    } catch (const std::exception& error) {
+        return error.what();
+    }
+    outcome.after = real_.look();
+    counts_.asked++;
+    counts_.decided += expected.verdict != Verdict::undecided ? 1 : 0;
+    counts_.allowed += outcome.allowed ? 1 : 0;
+    std::string what = breach(world_.tree, session.view, outcome);
+    if (what.empty()) {
+        what = disagreement(world_.tree, expected, outcome);
+    }
+    world_.tree = std::move(outcome.after);
+    return what;
+}
+
+std::optional<Failure> replay(Runner& runner, const Steps& steps) {
+    runner.begin();
+    for (std::size_t i = 0; i < steps.size(); i++) {
+        if (std::string what = runner.perform(steps[i]); !what.empty()) {
+            return Failure{i, std::move(what)};
+        }
+    }
+    return std::nullopt;
+}
+
+Steps shrink(Runner& runner, Steps steps) {
+    for (std::size_t size = steps.size() / 2; size > 0;) {
+        bool shrunk = false;
+        for (std::size_t start = 0; start < steps.size();) {
+            Steps fewer = steps;
+            const auto first = fewer.begin() + static_cast<std::ptrdiff_t>(start);
+            fewer.erase(first, first + static_cast<std::ptrdiff_t>(std::min(size, steps.size() - start)));
+            if (const auto failure = replay(runner, fewer)) {
+                fewer.resize(failure->step + 1);
+                steps = std::move(fewer);
+                shrunk = true;
+            } else {
+                start += size;
+            }
+        }
+        size = shrunk && size == 1 ? 1 : size / 2;
+    }
+    return steps;
+}
+
+} // namespace velt::model
