@@ -25,10 +25,7 @@ using std::chrono::milliseconds;
 
 // A caller waits five seconds for a start, and needs a little of that for itself.
 constexpr milliseconds startLimit{4700};
-constexpr milliseconds shortestBackOff{100};
-constexpr milliseconds longestBackOff{30000};
-constexpr milliseconds steadyRun{10000}; ///< a daemon that ran this long is not in a loop of crashes
-constexpr milliseconds patience{2000};   ///< between SIGTERM and SIGKILL
+constexpr milliseconds patience{2000}; ///< between SIGTERM and SIGKILL
 
 UniqueFd openSignals() {
     sigset_t wanted;
@@ -58,7 +55,7 @@ std::string statusLine(const DaemonState& state) {
 } // namespace
 
 Supervisor::Supervisor(std::filesystem::path folder, std::string name)
-    : folder_(std::move(folder)), name_(std::move(name)), backOff_(shortestBackOff) {}
+    : folder_(std::move(folder)), name_(std::move(name)) {}
 
 Result<> Supervisor::begin(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;
@@ -145,7 +142,7 @@ Result<> Supervisor::replaceDaemon(const DaemonOrder& order) {
     }
     VELT_RETURN_IF_ERROR(endDaemon());
     order_ = order;
-    backOff_ = shortestBackOff;
+    backOff_.forget();
     // A failed start is not tried again: the caller hears of it and decides.
     return startDaemon(deadline);
 }
@@ -216,11 +213,8 @@ void Supervisor::reapChildren() {
 
 void Supervisor::onDaemonEnd(int waitStatus) {
     const std::string reason = daemon_.ended(waitStatus).message;
-    if (Clock::now() - startedAt_ >= steadyRun) {
-        backOff_ = shortestBackOff;
-    }
     ::syslog(LOG_ERR, "%s has ended and is started again: %s", name_.c_str(), reason.c_str());
-    restartLater();
+    restartAfter(Clock::now() - startedAt_);
     publish(RunState::failed, reason);
 }
 
@@ -228,13 +222,12 @@ void Supervisor::restartDaemon() {
     ++restarts_;
     if (const auto started = startDaemon(Clock::now() + startLimit); !started) {
         ::syslog(LOG_ERR, "%s does not start: %s", name_.c_str(), started.error().message.c_str());
-        restartLater();
+        restartAfter(Clock::duration::zero());
     }
 }
 
-void Supervisor::restartLater() {
-    restartAt_ = Clock::now() + backOff_;
-    backOff_ = std::min(backOff_ * 2, longestBackOff);
+void Supervisor::restartAfter(Clock::duration run) {
+    restartAt_ = Clock::now() + backOff_.after(run);
 }
 
 int Supervisor::millisecondsToRestart() const {

@@ -4,6 +4,7 @@
 
 #include "base/result.h"
 #include "base/unique_fd.h"
+#include "standalone/supervise/back_off.h"
 #include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/daemon_process.h"
 #include "standalone/supervise/daemon_state.h"
@@ -46,7 +47,7 @@ private:
     void onDaemonEnd(int waitStatus);
     void restartDaemon();
     int millisecondsToRestart() const;
-    void restartLater();
+    void restartAfter(Clock::duration run); ///< of the daemon; zero when it did not start
     void publish(RunState state, std::string reason = {});
 
     std::filesystem::path folder_;
@@ -58,7 +59,7 @@ private:
     DaemonOrder order_;
     RunState state_ = RunState::stopped;
     Clock::time_point startedAt_;
-    std::chrono::milliseconds backOff_;
+    BackOff backOff_;
     std::uint64_t restarts_ = 0; ///< after the daemon had ended by itself
     std::optional<Clock::time_point> restartAt_;
     bool finished_ = false;

@@ -183,6 +183,12 @@ TEST_F(SupervisorTest, ADaemonThatKeepsDyingIsStartedLessAndLessOften) {
             pause + seconds(2)));
         EXPECT_GE(Clock::now() - killed, pause);
     }
+    // A start that is asked for ends the series: the next pause would have been of 1.6 seconds.
+    ASSERT_EQ(messageOf(sftp_.start(testOrder(port_, "two", {"--end-if", file}))), "");
+    const auto killed = Clock::now();
+    kill(daemonState(sftpDaemon).daemon);
+    ASSERT_TRUE(waitUntil([] { return isServing(daemonState(sftpDaemon)); }, seconds(4)));
+    EXPECT_LT(Clock::now() - killed, milliseconds(1600));
     std::ofstream(file).flush();
     EXPECT_TRUE(waitUntil([] { return daemonState(sftpDaemon).reason == "velt-test-daemon: told to end"; },
                           seconds(4)))
@@ -210,6 +216,26 @@ TEST_F(SupervisorTest, APausedServiceIsNotStartedAgainByItself) {
     start();
     ASSERT_EQ(messageOf(sftp_.pause()), "");
     std::this_thread::sleep_for(milliseconds(400));
+    EXPECT_EQ(daemonState(sftpDaemon).state, RunState::paused);
+    EXPECT_FALSE(accepts(port_));
+}
+
+TEST_F(SupervisorTest, APauseEndsTheWaitForARestart) {
+    start();
+    for (int i = 0; i < 2; ++i) { // after the second end it waits for 200 ms, after the third for 400
+        const ProcessId daemon = daemonState(sftpDaemon).daemon;
+        kill(daemon);
+        ASSERT_TRUE(waitUntil(
+            [&] {
+                const DaemonState now = daemonState(sftpDaemon);
+                return now.state == RunState::running && now.daemon != daemon;
+            },
+            seconds(5)));
+    }
+    kill(daemonState(sftpDaemon).daemon);
+    ASSERT_TRUE(waitUntil([] { return daemonState(sftpDaemon).state == RunState::failed; }, seconds(5)));
+    ASSERT_EQ(messageOf(sftp_.pause()), "");
+    std::this_thread::sleep_for(milliseconds(800));
     EXPECT_EQ(daemonState(sftpDaemon).state, RunState::paused);
     EXPECT_FALSE(accepts(port_));
 }
