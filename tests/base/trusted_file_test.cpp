@@ -59,6 +59,11 @@ TEST_F(TrustedFile, isARegularFile) {
     EXPECT_FALSE(readTrusted(folder_.path() / "absent"));
 }
 
+// This one says that it is empty, and is not: as one does that grows while it is read.
+TEST_F(TrustedFile, isOfTheSizeThatItSays) {
+    EXPECT_FALSE(readTrusted("/proc/self/stat"));
+}
+
 TEST_F(TrustedFile, isOfLimitedSize) {
     const auto file = fileWithMode(0600);
     ASSERT_EQ(truncate(file.c_str(), (off_t{16} << 20) + 1), 0);

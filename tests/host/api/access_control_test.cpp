@@ -176,6 +176,18 @@ TEST_F(HostAccess, AWrongTokenWaitsForItsAnswer) {
     EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::milliseconds(300));
 }
 
+// Guessing stays slow, however often it was tried.
+TEST_F(HostAccess, ThePlacesOfThoseWhoWaitedAreFreeAgain) {
+    limits.delayedRefusals = 1;
+    limits.refusalDelay = std::chrono::milliseconds(100);
+    start();
+    for (int i = 0; i < 3; ++i) {
+        const auto begin = std::chrono::steady_clock::now();
+        EXPECT_EQ(ask("GET", "/api", "Authorization: Bearer wrong\r\n").status, 401);
+        EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::milliseconds(100));
+    }
+}
+
 TEST_F(HostAccess, ViewersRead) {
     start();
     for (const std::string& path :
@@ -260,6 +272,17 @@ TEST_F(HostAccess, OthersOnTheUnixSocketNeedTheGroup) {
     EXPECT_EQ(askAs(nobody, admins, {}, request).status, 200);
     EXPECT_EQ(askAs(nobody, nobody, {}, requestText("GET", sftp + "get", viewer)).status, 200);
     EXPECT_EQ(askAs(nobody, nobody, {}, requestText("POST", sftp + "set", viewer, "{}")).status, 403);
+}
+
+TEST_F(HostAccess, WithoutTheGroupOnlyRootIsAdmin) {
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root can be somebody else";
+    }
+    settings.access.adminGroup = "no-such-group";
+    start();
+    const std::string request = requestText("GET", sftp + "get");
+    EXPECT_EQ(askAs(65534, 65534, {0, 1, 65534}, request).status, 403);
+    EXPECT_EQ(Client::unixSocket(socketPath).ask(request).status, 200);
 }
 
 TEST_F(HostAccess, TheUnixSocketIsClosedToOthers) {
@@ -393,6 +416,17 @@ TEST_F(HostAccess, ATokenThatCannotBeStoredIsNotGivenOut) {
     EXPECT_EQ(answer.json()["detail"],
               "Cannot make " + (parent / ".tokens.json.new").string() + ": Not a directory.");
     EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
+}
+
+TEST_F(HostAccess, ATokenThatCannotBeRemovedFromTheFileStays) {
+    start();
+    const std::string id = get("/api/tokens").json()["tokens"][1]["id"].asString();
+    const auto parent = settings.tokenFile.parent_path();
+    std::filesystem::remove_all(parent);
+    std::ofstream(parent) << "in the way";
+    EXPECT_EQ(ask("DELETE", "/api/tokens/" + id, admin).status, 500);
+    EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
+    EXPECT_EQ(ask("GET", "/healthz", viewer).status, 200) << "it comes back with the next start";
 }
 
 } // namespace

@@ -304,6 +304,22 @@ TEST_F(HostRows, TheRowsAreListed) {
     EXPECT_EQ(reads, 8);
 }
 
+TEST_F(HostRows, AChangeThatFailsHalfWayIsOneForThoseWhoHaveSeenTheSettings) {
+    const std::string seen = get(sftp + "get").header("etag");
+    platform.fail("VLIBServiceStart");
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":2222})").status, 500);
+    EXPECT_EQ(platform.sftp.port, 2222);
+    EXPECT_NE(get(sftp + "get").header("etag"), seen);
+}
+
+TEST_F(HostRows, WhatWasSeenInAFormerRunIsNotTakenForTheSettingsOfThisOne) {
+    const std::string seen = get(sftp + "get").header("etag");
+    stop();
+    start();
+    const std::string ifSeen = admin + "If-Match: " + seen + "\r\n";
+    EXPECT_EQ(ask("POST", sftp + "set", ifSeen, R"({"enable":true,"portnum":2222})").status, 412);
+}
+
 TEST_F(HostRows, AChangeOfWhatWasSeenIsRefusedOnceSomethingElseWasChanged) {
     const std::string seen = get(sftp + "get").header("etag");
     EXPECT_EQ(get(ftp + "3/get").header("etag"), seen) << "reading changes nothing";

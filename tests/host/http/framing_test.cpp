@@ -133,6 +133,14 @@ TEST(RequestReading, ChunksMayArriveInAnyPieces) {
     }
 }
 
+TEST_F(HostFraming, TheHeaderOfAChunkIsOfLimitedLength) {
+    const std::string head = "POST " + target + "get HTTP/1.1\r\nHost: localhost\r\n" + admin +
+                             "Transfer-Encoding: chunked\r\n\r\n";
+    const Answer answer = refused(head + "2;" + std::string(limits.head, 'x'));
+    EXPECT_EQ(answer.status, 400);
+    EXPECT_EQ(answer.json()["detail"], "The header of a chunk is too long.");
+}
+
 TEST_F(HostFraming, UnknownTransferCodingsAreNotImplemented) {
     for (const char* coding : {"gzip", "identity", "gzip, chunked", "chunked, gzip", "xchunked"}) {
         const Answer answer = refused("POST " + target + "set HTTP/1.1\r\nHost: localhost\r\n" + admin +

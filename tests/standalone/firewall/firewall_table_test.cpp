@@ -14,13 +14,12 @@
 #include "tests/standalone/firewall/private_network.h"
 #include "tests/standalone/supervise/daemon_test.h"
 #include "tests/support/run_program.h"
+#include "tests/support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
 #include <sched.h>
-#include <sys/socket.h>
+#include <sys/mount.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -34,26 +33,6 @@
 
 namespace velt::test {
 namespace {
-
-/// Listens on all addresses of the private network.
-class OpenPort {
-public:
-    explicit OpenPort(int port) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-        const int on = 1; // ended connections of a former listener do not count
-        ::setsockopt(descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_port = htons(static_cast<in_port_t>(port));
-        EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-        EXPECT_EQ(::listen(descriptor_, 16), 0);
-    }
-    ~OpenPort() { ::close(descriptor_); }
-    OpenPort(const OpenPort&) = delete;
-    OpenPort& operator=(const OpenPort&) = delete;
-
-private:
-    int descriptor_;
-};
 
 std::string listTable() {
     return runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).output;
@@ -329,6 +308,51 @@ TEST_F(FirewallTest, AMarkFromBeforeABootIsNoSignOfRules) {
     setMode("mode = off");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
     EXPECT_NE(listTable(), "") << "the table is somebody else's";
+}
+
+/// While it lives, loading rules is followed by these lines of a shell script, in which "nft" is the real
+/// one.
+class LoadingFollowedBy {
+public:
+    explicit LoadingFollowedBy(const std::string& lines) {
+        const auto real = folder_.path() / "nft";
+        std::filesystem::copy_file(program_, real);
+        const auto script = folder_.write("script", "#!/bin/sh\nPATH=" + folder_.path().string() +
+                                                        ":$PATH\nnft \"$@\" || exit\n" +
+                                                        "[ \"$1\" = -f ] || exit 0\n" + lines + "\n");
+        std::filesystem::permissions(script, std::filesystem::perms::owner_all);
+        EXPECT_EQ(unshare(CLONE_NEWNS), 0);
+        EXPECT_EQ(mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr), 0);
+        EXPECT_EQ(mount(script.c_str(), program_, nullptr, MS_BIND, nullptr), 0);
+    }
+    ~LoadingFollowedBy() { umount2(program_, MNT_DETACH); }
+    LoadingFollowedBy(const LoadingFollowedBy&) = delete;
+    LoadingFollowedBy& operator=(const LoadingFollowedBy&) = delete;
+
+private:
+    static constexpr const char* program_ = "/usr/sbin/nft";
+    TemporaryFolder folder_;
+};
+
+TEST_F(FirewallTest, RulesOfALoadingThatWasCutShortAreKnown) {
+    {
+        const LoadingFollowedBy loading("exit 1");
+        EXPECT_LT(VELTFwRuleHup(), 0);
+    }
+    ASSERT_NE(listTable(), "");
+    setMode("mode = off");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_EQ(listTable(), "");
+}
+
+TEST_F(FirewallTest, WhatSomebodyElseChangesDuringTheLoadingIsMended) {
+    {
+        const LoadingFollowedBy loading("nft delete table inet velt_fileserv");
+        ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    }
+    ASSERT_EQ(listTable(), "");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    EXPECT_NE(listTable(), "");
 }
 
 /// Runs in a child without the right to administer the network: its exit status is what `test` returns.

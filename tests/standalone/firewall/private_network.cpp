@@ -2,6 +2,8 @@
 
 #include "tests/support/run_program.h"
 
+#include <gtest/gtest.h>
+
 #include <arpa/inet.h>
 #include <fcntl.h>
 #include <netinet/in.h>
@@ -113,6 +115,20 @@ bool PrivateNetwork::neighbourReaches(int port) const {
     char answer = 0;
     return ::write(requests_, &port, sizeof port) == static_cast<ssize_t>(sizeof port) &&
            ::read(answers_, &answer, 1) == 1 && answer == 'y';
+}
+
+OpenPort::OpenPort(int port) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    const int on = 1; // ended connections of a former listener do not count
+    ::setsockopt(descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_port = htons(static_cast<in_port_t>(port));
+    EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+    EXPECT_EQ(::listen(descriptor_, 16), 0);
+}
+
+OpenPort::~OpenPort() {
+    ::close(descriptor_);
 }
 
 } // namespace velt::test

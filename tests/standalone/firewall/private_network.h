@@ -30,6 +30,18 @@ private:
     int answers_ = -1;
 };
 
+/// Listens on all addresses of the private network.
+class OpenPort {
+public:
+    explicit OpenPort(int port);
+    ~OpenPort();
+    OpenPort(const OpenPort&) = delete;
+    OpenPort& operator=(const OpenPort&) = delete;
+
+private:
+    int descriptor_;
+};
+
 } // namespace velt::test
 
 #endif

@@ -58,6 +58,16 @@ TEST(EventBus, ASubscriberThatThrowsHidesNothingFromTheNext) {
     EXPECT_EQ(heard, 1);
 }
 
+TEST(EventBus, ASubscriptionThatEndsMeanwhileHearsNothing) {
+    int heard = 0;
+    Subscription second = 0;
+    const Subscription first = subscribeEvents([&](const SystemEvent&) { unsubscribe(second); });
+    second = subscribeEvents([&](const SystemEvent&) { ++heard; });
+    publish(eventCalled("a"));
+    unsubscribe(first);
+    EXPECT_EQ(heard, 0);
+}
+
 TEST(EventBus, ASubscriberMayEndItsOwnSubscription) {
     int heard = 0;
     Subscription subscription = 0;

@@ -11,6 +11,7 @@
 #include <json/json.h>
 
 #include <sys/resource.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -147,6 +148,15 @@ TEST_F(EventFileTest, AFileThatCannotBeWrittenIsAnError) {
     EXPECT_LT(emit("e", {}), 0);
     EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::event));
     EXPECT_NE(lastErrorSentence().find("events.jsonl"), std::string::npos);
+}
+
+TEST_F(EventFileTest, IsNoReadingForEverybody) {
+    umask(0);
+    ASSERT_EQ(emit("e", {}), 0);
+    umask(022);
+    struct stat status {};
+    ASSERT_EQ(stat((folder_.path() / "var/log/velt/events.jsonl").c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0640U) << "actors and addresses are in it";
 }
 
 TEST_F(EventFileTest, FollowsARotation) {

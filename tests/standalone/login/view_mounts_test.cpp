@@ -1,6 +1,7 @@
 // Real mounts, in a mount namespace of the test's own.
 #include "standalone/login/view_mounts.h"
 
+#include "base/ask_child.h"
 #include "standalone/login/open_folder.h"
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
@@ -8,11 +9,17 @@
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
+#include <linux/filter.h>
+#include <linux/seccomp.h>
 #include <sched.h>
 #include <sys/mount.h>
+#include <sys/prctl.h>
 #include <sys/statvfs.h>
+#include <sys/syscall.h>
 
+#include <array>
 #include <cerrno>
+#include <cstddef>
 #include <cstring>
 
 namespace velt::test {
@@ -75,23 +82,24 @@ TEST_F(ViewMounts, forWritingAreWritable) {
     EXPECT_TRUE(fs::exists(share_ / "new"));
 }
 
-TEST_F(ViewMounts, letNothingBeExecuted) {
-    const auto mayExecute = [](const fs::path& place) {
+TEST_F(ViewMounts, giveNoFileRightsOfItsOwn) {
+    constexpr unsigned long wanted = ST_NOSUID | ST_NODEV | ST_NOEXEC;
+    const auto flags = [](const fs::path& place) {
         struct statvfs facts {};
-        return statvfs(place.c_str(), &facts) != 0 || (facts.f_flag & ST_NOEXEC) == 0;
+        return statvfs(place.c_str(), &facts) == 0 ? facts.f_flag & wanted : 0;
     };
     ASSERT_EQ(messageOf(showFolder(view_, share(Access::write, {{"inner", Access::read}}))), "");
     for (const char* place : {"", "disk", "inner"}) {
-        EXPECT_FALSE(mayExecute(view_ / place)) << place;
+        EXPECT_EQ(flags(view_ / place), wanted) << place;
     }
     SideBySide view(view_);
     ASSERT_EQ(messageOf(view.begin()), "");
     ASSERT_EQ(messageOf(view.add("share", share(Access::write))), "");
     ASSERT_EQ(messageOf(view.finish()), "");
     for (const char* place : {"", "share", "share/disk"}) {
-        EXPECT_FALSE(mayExecute(view_ / place)) << place;
+        EXPECT_EQ(flags(view_ / place), wanted) << place;
     }
-    EXPECT_TRUE(mayExecute(share_)) << "the server's own mount does not change";
+    EXPECT_EQ(flags(share_), 0U) << "the server's own mount does not change";
 }
 
 TEST_F(ViewMounts, doNotFollowWhatIsMountedLater) {
@@ -133,6 +141,31 @@ TEST_F(ViewMounts, sideBySideLeaveOutWhatCannotBeRestricted) {
     EXPECT_EQ(whyNotWritable(view_ / "good"), "");
     EXPECT_FALSE(fs::exists(view_ / "bad"));
     EXPECT_EQ(whyNotWritable(view_), readOnly_);
+}
+
+/// From now on this process can unmount nothing.
+bool forbidUnmounting() {
+    std::array<sock_filter, 4> program{{
+        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_umount2, 0, 1),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EPERM),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
+    }};
+    const sock_fprog filter{program.size(), program.data()};
+    return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
+           prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &filter) == 0;
+}
+
+TEST_F(ViewMounts, sideBySideAreRefusedWhereWhatIsNotRestrictedStays) {
+    const auto outcome = askChild([this] {
+        SideBySide view(view_);
+        const bool good = forbidUnmounting() && view.begin() && view.add("good", share(Access::write)) &&
+                          !view.add("bad", share(Access::write, {{"absent", Access::read}}));
+        return !good ? 1 : view.finish() ? 2 : 0;
+    });
+    ASSERT_EQ(messageOf(outcome), "");
+    EXPECT_EQ(*outcome, 0) << "2: what may show too much can be used";
+    EXPECT_TRUE(fs::exists(view_ / "bad")) << "the test needs it to stay";
 }
 
 } // namespace

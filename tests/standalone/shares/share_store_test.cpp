@@ -1,5 +1,6 @@
 #include "standalone/shares/share_store.h"
 
+#include "base/file.h"
 #include "platform/core.h"
 #include "standalone/contract/last_error.h"
 #include "standalone/core/error_number.h"
@@ -11,8 +12,12 @@
 
 #include <gtest/gtest.h>
 
+#include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
+
+#include <thread>
 
 namespace velt {
 namespace {
@@ -49,6 +54,26 @@ TEST_F(ShareStoreTest, GivesTheFileInItsOrder) {
     ASSERT_EQ(shares->size(), 2U);
     EXPECT_EQ((*shares)[0].name, "zebra");
     EXPECT_EQ((*shares)[1].name, "alpha");
+}
+
+// The old file is a pipe, so that it can be exchanged in the very middle of its reading.
+TEST_F(ShareStoreTest, SeesAChangeThatCameWhileTheFormerFileWasRead) {
+    ASSERT_EQ(messageOf(test::storeShares({shareCalled("new")})), "");
+    const auto file = folder_.path() / "etc/velt/shares.json";
+    const auto aside = folder_.path() / "aside";
+    std::filesystem::rename(file, aside);
+    ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
+    std::thread writer([&] {
+        const UniqueFd pipe(open(file.c_str(), O_WRONLY | O_CLOEXEC));
+        EXPECT_TRUE(
+            writeAll(pipe.get(), R"({"version": 1, "shares": [{"name": "old", "path": "/srv/old"}]})"));
+        std::filesystem::rename(aside, file);
+    });
+    const auto former = loadShares();
+    writer.join();
+    ASSERT_EQ(messageOf(former), "");
+    EXPECT_EQ(former->at(0).name, "old");
+    EXPECT_EQ(loadShares()->at(0).name, "new");
 }
 
 TEST_F(ShareStoreTest, SeesEachChangeAtOnce) {

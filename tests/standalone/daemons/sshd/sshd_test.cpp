@@ -73,6 +73,15 @@ TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
+TEST_F(SftpCandidate, isTestedOnceMoreBeforeItIsPlanned) {
+    const auto keys = hostKeys();
+    ASSERT_EQ(messageOf(keys), "");
+    root_.write("var/lib/velt/ssh/host_ed25519_key", "damaged");
+    root_.write("var/lib/velt/ssh/host_rsa_key", "damaged");
+    const std::string refusal = messageOf(planSftpDaemon());
+    EXPECT_NE(refusal.find("The SFTP daemon refuses its configuration"), std::string::npos) << refusal;
+}
+
 TEST_F(SftpCandidate, keepsItsKeys) {
     const auto keys = hostKeys();
     ASSERT_EQ(messageOf(keys), "");
