@@ -1,6 +1,7 @@
 #include "host/api/rows.h"
 
 #include "base/json_value.h"
+#include "host/api/parameter_check.h"
 #include "host/api/problem.h"
 #include "host/api/row_answer.h"
 #include "host/api/service_status.h"
@@ -57,6 +58,9 @@ HttpResponse Rows::call(const Row& row, const Call& call) {
     const auto parameters = parseObject(call.request.body);
     if (!parameters) {
         return notAnObject(parameters.error(), " Nothing was changed.", call.id);
+    }
+    if (const auto unfit = findUnfitText(row, *parameters)) {
+        return fieldProblem(422, *unfit, " Nothing was changed.", call.id);
     }
     // Writes run one at a time, so nothing can come between this check and the change.
     if (!row.reads() && !revision_.allows(call.request.ifMatch)) {

@@ -133,6 +133,9 @@ TEST_F(HostInjection, noTextOfARequestIsMoreThanAText) {
             if (attempt.what == std::string("bytes that are no UTF-8")) {
                 EXPECT_EQ(answer.status, 400) << answer.body;
             }
+            if (attempt.what == std::string("a NUL")) {
+                EXPECT_EQ(answer.status, 422) << answer.body;
+            }
             EXPECT_FALSE(contains(answer.body, "The module is faulty")) << answer.body;
             EXPECT_FALSE(contains(answer.body, "The host failed")) << answer.body;
             expectNoTrace();

@@ -65,6 +65,35 @@ TEST_F(HostRows, ARefusedParameterIsExplained) {
                                  "Nothing was changed.");
 }
 
+TEST_F(HostRows, ATextThatWouldBeCutOnTheWayIsRefused) {
+    const auto expectRefusal = [&](const std::string& target, const std::string& body,
+                                   const std::string& field, const std::string& expected) {
+        const Answer answer = post(target, body);
+        EXPECT_EQ(answer.status, 422) << body;
+        const Json::Value problem = answer.json();
+        EXPECT_EQ(problem["errors"].size(), 1U) << body;
+        EXPECT_EQ(problem["errors"][0]["field"], field) << body;
+        EXPECT_EQ(problem["errors"][0]["expected"], expected) << body;
+        EXPECT_EQ(problem["detail"], field + ": expected " + expected + ". Nothing was changed.");
+        EXPECT_FALSE(problem.isMember("code")) << "the module was not asked";
+    };
+    const std::string noNul = "a text without the character U+0000";
+    expectRefusal(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":false,"ext_ip":"192.0.2.1\u0000x"})",
+                  "ext_ip", noNul);
+    expectRefusal(chroot + "1/add", R"({"id":["alice","bob\u0000"]})", "id[1]", noNul);
+    expectRefusal(chroot + "1/list", R"({"substr":"\u0000"})", "substr", noNul);
+    expectRefusal(chroot + "2/save", R"({"rules":[{"type":"user","name":"a","path":"/x\u0000"}]})",
+                  "rules[0].path", noNul);
+    const std::string oneLine = "a text without control characters";
+    expectRefusal(ftp + "3/set", R"({"custom_port_range":true,"custom_port":"50000:50100\njunk"})",
+                  "custom_port", oneLine);
+    expectRefusal(ftp + "1/set", R"({"ext_ip":"192.0.2.1\u001b"})", "ext_ip", oneLine);
+    expectRefusal(security + "set", R"({"anonymous_chroot_share":"a\u007f"})", "anonymous_chroot_share",
+                  oneLine);
+    EXPECT_EQ(platform.journal.size(), 0U);
+    EXPECT_NE(post(chroot + "1/add", R"({"id":["two\nlines"]})").status, 422) << "what the module decides";
+}
+
 TEST_F(HostRows, AMissingParameterIsNamed) {
     const Json::Value problem = post(ftp + "3/set", R"({"enable_ftp":true})").json();
     ASSERT_EQ(problem["errors"].size(), 1U);

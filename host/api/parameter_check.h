@@ -1,0 +1,21 @@
+// Texts in parameters that would not arrive as they were sent.
+#ifndef VELT_HOST_API_PARAMETER_CHECK_H
+#define VELT_HOST_API_PARAMETER_CHECK_H
+
+#include "host/api/problem.h"
+#include "host/module/module_table.h"
+
+#include <json/value.h>
+
+#include <optional>
+
+namespace velt::host {
+
+/// The first text, at any depth, that contains U+0000: the platform takes only what is before it. And the
+/// first setting that is a text, which is always one line, with a control character. Nothing when there is
+/// none; the module decides on all else.
+std::optional<FieldError> findUnfitText(const Row& row, const Json::Value& parameters);
+
+} // namespace velt::host
+
+#endif
