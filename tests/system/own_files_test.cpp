@@ -20,6 +20,14 @@ protected:
         fs::create_directories(folder);
         EXPECT_EQ(chown(folder.c_str(), aliceId, aliceId), 0);
     }
+    /// What lies in the home.
+    static std::string names() {
+        std::string all;
+        for (const auto& entry : fs::directory_iterator(home)) {
+            all += entry.path().filename().string() + ' ';
+        }
+        return all;
+    }
     /// Sends both names of a move; the code of the last answer.
     static int move(FtpSession& session, const std::string& from, const std::string& to) {
         const int known = session.command("RNFR " + from).code;
@@ -40,6 +48,16 @@ TEST_F(OwnFiles, areNotMadeOverFtp) {
         EXPECT_EQ(move(session, "home-of", name), 550) << name;
         EXPECT_FALSE(fs::exists(home / name)) << name;
     }
+    for (const std::string way : {"~/", "//", "./", "/./", "/x/../", "~alice/", "../", "\xc2\xad/../"}) {
+        EXPECT_EQ(session.send("STOR " + way + ".profile", "x"), 550) << way;
+        EXPECT_EQ(session.command("MKD " + way + ".ssh").code, 550) << way;
+        EXPECT_EQ(session.command("MKD " + way + ".ssh/").code, 550) << way;
+        EXPECT_GE(move(session, way + "home-of", way + ".profile"), 550) << way;
+    }
+    for (const char* command : {"SITE CPFR home-of", "SITE SYMLINK home-of .profile", "SITE MKDIR .ssh"}) {
+        EXPECT_GE(session.command(command).code, 500) << command;
+    }
+    EXPECT_EQ(names(), "home-of ");
     ASSERT_EQ(session.command("MKD prepared").code, 257);
     ASSERT_EQ(session.send("STOR prepared/authorized_keys", "x"), 226);
     EXPECT_EQ(move(session, "prepared", "./x/../.ssh"), 550);
