@@ -119,7 +119,7 @@ TEST_F(HostFtp, theExternalAddressAndForeignDataAddresses) {
          true,
          false,
          [](const Json::Value& on) {
-             EXPECT_EQ(aliceAt().command("PORT 127,0,0,2,200,1").code, on.asBool() ? 200 : 500);
+             EXPECT_EQ(aliceAt().command("PORT 192,0,2,9,200,1").code, on.asBool() ? 200 : 500);
          },
          {},
          {}},

@@ -77,9 +77,9 @@ TEST_F(ModuleService, announcesTheExternalAddressWhenAsked) {
 TEST_F(ModuleService, letsDataGoElsewhereWithFxpOnly) {
     ASSERT_EQ(setFtp(R"({"enable_fxp": true})").code, 0);
     EXPECT_EQ(getFtp()["enable_fxp"], true);
-    EXPECT_EQ(aliceAt().command("PORT 127,0,0,2,200,1").code, 200);
+    EXPECT_EQ(aliceAt().command("PORT 192,0,2,9,200,1").code, 200);
     ASSERT_EQ(setFtp(R"({"enable_fxp": false})").code, 0);
-    EXPECT_EQ(aliceAt().command("PORT 127,0,0,2,200,1").code, 500);
+    EXPECT_EQ(aliceAt().command("PORT 192,0,2,9,200,1").code, 500);
 }
 
 TEST_F(ModuleService, narrowsTheAlgorithmsWithFips) {
