@@ -15,6 +15,7 @@
 #include "standalone/login/login_program.h"
 #include "standalone/login/own_files.h"
 #include "standalone/login/refused_commands.h"
+#include "standalone/login/session_mounts.h"
 
 #include <sched.h>
 
@@ -176,6 +177,30 @@ MODRET set_velt_login_view(cmd_rec* cmd) {
     return PR_HANDLED(cmd);
 }
 
+/* The daemon is about to serve. Where no session can have mounts of its own, it would start well, and refuse
+ * every login. */
+static void on_startup(const void* data, void* ignored) {
+    int error = 0;
+    (void)data;
+    (void)ignored;
+
+    if (getuid() != 0) {
+        return;
+    }
+    PRIVS_ROOT
+    error = velt_try_session_mounts();
+    PRIVS_RELINQUISH
+    if (error != 0) {
+        pr_log_pri(PR_LOG_ERR, "FTP sessions cannot be confined here: cannot make a mount namespace: %s",
+                   strerror(error));
+        exit(EXIT_FAILURE);
+    }
+}
+
+static int velt_init(void) {
+    return pr_event_register(&velt_login_module, "core.startup", on_startup, NULL);
+}
+
 static int velt_sess_init(void) {
     int exact = FALSE;
     /* The one for all paths: one of our own would not be asked for the names in the first folder. */
@@ -197,6 +222,6 @@ static conftable velt_conftab[] = {
 };
 
 module velt_login_module = {
-    NULL, NULL, 0x20,           "velt_login",   velt_conftab, velt_refused_commands,
-    NULL, NULL, velt_sess_init, MODULE_VERSION, NULL,         0,
+    NULL, NULL,      0x20,           "velt_login",   velt_conftab, velt_refused_commands,
+    NULL, velt_init, velt_sess_init, MODULE_VERSION, NULL,         0,
 };

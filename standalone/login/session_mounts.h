@@ -1,14 +1,9 @@
-// Whether FTP sessions can have their own mounts.
+/* Whether sessions can be given mounts of their own. */
 #ifndef VELT_STANDALONE_LOGIN_SESSION_MOUNTS_H
 #define VELT_STANDALONE_LOGIN_SESSION_MOUNTS_H
 
-#include "base/result.h"
-
-namespace velt {
-
-/// Tries in a child process what each login needs; an error when this process may not do it. Thread-safe.
-Result<> checkSessionMounts();
-
-} // namespace velt
+/* Tries it in a child of this process, which needs root's rights for it. 0 when that works, else the errno of
+ * what failed. */
+int velt_try_session_mounts(void);
 
 #endif

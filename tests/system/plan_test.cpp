@@ -6,12 +6,6 @@
 #include "tests/support/files.h"
 #include "tests/support/result.h"
 
-#include <linux/capability.h>
-#include <sys/syscall.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <array>
 #include <filesystem>
 #include <iterator>
 
@@ -90,27 +84,6 @@ TEST_F(FtpPlan, isNoneWhenNeitherServiceIsEnabled) {
     const auto none = planFtpDaemon();
     ASSERT_EQ(messageOf(none), "");
     EXPECT_FALSE(*none);
-}
-
-TEST_F(FtpPlan, isRefusedWhereSessionsCannotHaveMountsOfTheirOwn) {
-    hash();
-    const pid_t child = fork();
-    if (child == 0) {
-        // Root without the right to make mounts, as in many containers.
-        __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
-        std::array<__user_cap_data_struct, 2> rights{};
-        syscall(SYS_capget, &header, rights.data());
-        rights[0].effective &= ~(1U << CAP_SYS_ADMIN);
-        syscall(SYS_capset, &header, rights.data());
-        const bool told = messageOf(planFtpDaemon()) ==
-                          "FTP sessions cannot be confined here: cannot make a mount namespace: "
-                          "Operation not permitted.";
-        _exit(told ? 0 : 1);
-    }
-    int status = -1;
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    EXPECT_EQ(status, 0);
-    EXPECT_EQ(messageOf(planFtpDaemon()), "");
 }
 
 TEST_F(FtpPlan, keepsTheFormerConfigurationUntilItIsToBeRemoved) {

@@ -14,8 +14,11 @@
 
 #include <gtest/gtest.h>
 
+#include <linux/capability.h>
 #include <netinet/in.h>
+#include <sys/prctl.h>
 #include <sys/socket.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <chrono>
@@ -133,6 +136,25 @@ TEST_F(ControlledServices, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {
     }
     EXPECT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     EXPECT_TRUE(isServing(serviceState("ftpd")));
+}
+
+TEST_F(ControlledServices, ftpDoesNotStartWhereSessionsCannotHaveMountsOfTheirOwn) {
+    record.service_flags = VELT_FTP_SERVICE_PLAIN;
+    ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
+    // Root without the right to make mounts, as in many containers.
+    const pid_t child = fork();
+    if (child == 0) {
+        const bool refused =
+            prctl(PR_CAPBSET_DROP, CAP_SYS_ADMIN, 0, 0, 0) == 0 && VLIBServiceStart("ftpd", 0) < 0;
+        const bool told = lastErrorSentence() ==
+                          "The FTP daemon does not start: FTP sessions cannot be confined here: cannot make "
+                          "a mount namespace: Operation not permitted.";
+        _exit(refused && told ? 0 : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+    EXPECT_EQ(VLIBServiceStart("ftpd", 0), 0) << lastErrorSentence();
 }
 
 TEST_F(ControlledServices, unconfinedUsersHaveTheirShareRootThroughTheSupervisor) {

@@ -6,7 +6,6 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/proftpd/proftpd_surroundings.h"
-#include "standalone/login/session_mounts.h"
 #include "standalone/rules/rule_store.h"
 
 #include <sys/stat.h>
@@ -91,8 +90,6 @@ Result<std::optional<DaemonPlan>> planFtpDaemon() {
     VELT_RETURN_IF_ERROR(checkFtpSettings(settings));
     VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
     VELT_RETURN_IF_ERROR(testRendering(settings, found.places));
-    // Else the daemon would start well, and refuse every login.
-    VELT_RETURN_IF_ERROR(found.places.accountFiles ? Result<>() : checkSessionMounts());
     VELT_ASSIGN_OR_RETURN(auto plan, writePlan(settings, found));
     return plan;
 }
