@@ -7,6 +7,7 @@
 #include <fcntl.h>
 #include <netdb.h>
 #include <netinet/in.h>
+#include <sys/fsuid.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
@@ -141,9 +142,20 @@ void removeStale(const std::filesystem::path& path, const sockaddr_un& address) 
     unlink(path.c_str());
 }
 
+/// As a member, an owner may give a file to a group without the right to give it to anybody. Only this thread
+/// is one, for as long as this takes.
+bool giveAsMember(const std::filesystem::path& path, gid_t group) {
+    const auto former = static_cast<gid_t>(setfsgid(group));
+    const bool given = lchown(path.c_str(), static_cast<uid_t>(-1), group) == 0;
+    const int error = errno;
+    setfsgid(former);
+    errno = error;
+    return given;
+}
+
 void giveToGroup(const std::filesystem::path& path, const std::string& name) {
     const auto group = groupNamed(name);
-    const bool given = !group || lchown(path.c_str(), static_cast<uid_t>(-1), *group) == 0;
+    const bool given = !group || giveAsMember(path, *group);
     // A user outside the group cannot give it the socket. Such a user runs a host for personal use.
     if (!given && (errno != EPERM || geteuid() == 0)) {
         throw ListenError(cannot("give", path.string() + " to the group " + name).message);

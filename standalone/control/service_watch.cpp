@@ -4,6 +4,7 @@
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/error_number.h"
+#include "standalone/core/systemd.h"
 
 #include <syslog.h>
 

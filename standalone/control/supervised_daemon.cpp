@@ -7,6 +7,7 @@
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
+#include "standalone/core/systemd.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/supervise/control_channel.h"
 
@@ -15,7 +16,6 @@
 
 #include <chrono>
 #include <optional>
-#include <system_error>
 #include <thread>
 #include <utility>
 
@@ -126,12 +126,6 @@ Result<> SupervisedDaemon::stop() {
 
 DaemonState daemonState(const Daemon& daemon) {
     return loadDaemonState(stateFile(statePath(paths::run), daemon.name)).value_or(DaemonState{});
-}
-
-bool systemdKeepsSupervisors() {
-    // Units are the machine's, so an installation below another root keeps its daemons to itself.
-    std::error_code error;
-    return std::filesystem::is_directory("/run/systemd/system", error) && statePath("/") == "/";
 }
 
 Result<std::filesystem::path> runFolder() {

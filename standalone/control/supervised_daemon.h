@@ -48,9 +48,6 @@ private:
 /// What is known about the daemon now. May be asked at any time.
 DaemonState daemonState(const Daemon& daemon);
 
-/// Whether systemd starts a supervisor again that was killed.
-bool systemdKeepsSupervisors();
-
 /// The folder of the files about running daemons, which is made when it is missing.
 Result<std::filesystem::path> runFolder();
 

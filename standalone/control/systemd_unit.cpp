@@ -9,6 +9,38 @@
 
 namespace velt {
 
+namespace {
+
+// What neither the daemons nor their sessions need. Sessions work anywhere in homes and shares, which may lie
+// anywhere, and log in by what the machine has: its modules for PAM and for accounts run in the daemons and
+// may limit resources, mount homes or write to the audit log. So these stay as they are on the machine:
+// - its files, for writing where modes allow it (ProtectSystem=, ProtectHome=, PrivateTmp=);
+// - set-group-id folders (RestrictSUIDSGID=; ProFTPD's sessions get no such bits by our module);
+// - code that is made at run time, as some modules do (MemoryDenyWriteExecute=);
+// - the right to mount, for the views of sessions (CAP_SYS_ADMIN, @mount).
+constexpr std::string_view restrictions =
+    "CapabilityBoundingSet=CAP_AUDIT_WRITE CAP_CHOWN CAP_DAC_OVERRIDE CAP_DAC_READ_SEARCH CAP_FOWNER "
+    "CAP_FSETID CAP_KILL CAP_NET_BIND_SERVICE CAP_SETGID CAP_SETUID CAP_SYS_ADMIN CAP_SYS_CHROOT "
+    "CAP_SYS_NICE "
+    "CAP_SYS_PTRACE CAP_SYS_RESOURCE\n"
+    "NoNewPrivileges=yes\n"
+    "SystemCallFilter=~@clock @cpu-emulation @debug @module @obsolete @raw-io @reboot @swap\n"
+    "SystemCallErrorNumber=EPERM\n"
+    "SystemCallArchitectures=native\n"
+    "PrivateDevices=yes\n"
+    "ProtectClock=yes\n"
+    "ProtectControlGroups=yes\n"
+    "ProtectHostname=yes\n"
+    "ProtectKernelLogs=yes\n"
+    "ProtectKernelModules=yes\n"
+    "ProtectKernelTunables=yes\n"
+    "RestrictAddressFamilies=AF_UNIX AF_INET AF_INET6 AF_NETLINK\n"
+    "RestrictNamespaces=mnt\n"
+    "RestrictRealtime=yes\n"
+    "LockPersonality=yes\n";
+
+} // namespace
+
 std::string unitName(const Daemon& daemon) {
     return "velt-" + std::string(daemon.name) + ".service";
 }
@@ -55,7 +87,8 @@ std::string renderUnit(const Daemon& daemon, const std::filesystem::path& folder
          << "TimeoutStartSec=10s\n"
          << "TimeoutStopSec=5s\n"
          // A session too large for the machine's memory must not end the others.
-         << "OOMPolicy=continue\n";
+         << "OOMPolicy=continue\n"
+         << restrictions;
     return text.str();
 }
 

@@ -1,11 +1,19 @@
 #include "standalone/shares/folder_access.h"
 
 #include "base/ask_child.h"
+#include "base/unique_fd.h"
 #include "standalone/core/error_number.h"
+#include "standalone/core/systemd.h"
 
-#include <sys/stat.h>
+#include <fcntl.h>
 #include <sys/syscall.h>
 #include <unistd.h>
+
+#include <array>
+#include <cerrno>
+#include <climits>
+#include <cstdio>
+#include <cstring>
 
 namespace velt {
 
@@ -22,16 +30,42 @@ bool takeIdentity(const Identity& who) {
            syscall(SYS_setresuid, who.uid, who.uid, who.uid) == 0;
 }
 
+int openBelow(int root, const char* path) {
+    path += std::strspn(path, "/");
+    return openat(root, *path == '\0' ? "." : path, O_PATH | O_DIRECTORY | O_CLOEXEC);
+}
+
+/// The folder as it is below that root. Absolute links on the way lead below this process's own, so the place
+/// that they lead to is opened once more.
+int openFolder(int root, const char* path) {
+    const int found = openBelow(root, path);
+    std::array<char, 32> link{};
+    std::array<char, PATH_MAX> place{};
+    std::snprintf(link.data(), link.size(), "/proc/self/fd/%d", found);
+    const bool known = found >= 0 && readlink(link.data(), place.data(), place.size() - 1) > 0;
+    return known ? openBelow(root, place.data()) : -1;
+}
+
+bool allows(int folder, int mode) {
+    return syscall(SYS_faccessat2, folder, "", mode, AT_EMPTY_PATH) == 0;
+}
+
 /// Runs in the child, where only system calls are safe.
-int askKernel(const char* path, const Identity& who, bool changeIdentity) {
+int askKernel(int root, const char* path, const Identity& who, bool changeIdentity) {
     if (changeIdentity && !takeIdentity(who)) {
         return cannotTell;
     }
-    struct stat status {};
-    const bool readable =
-        stat(path, &status) == 0 && S_ISDIR(status.st_mode) && access(path, R_OK | X_OK) == 0;
-    const bool writable = readable && access(path, W_OK) == 0;
+    const int folder = openFolder(root, path);
+    const bool readable = folder >= 0 && allows(folder, R_OK | X_OK);
+    const bool writable = readable && allows(folder, W_OK);
     return static_cast<int>(writable ? Access::write : readable ? Access::read : Access::none);
+}
+
+/// The root below which the services find folders. The unit of this process makes mounts read-only, which
+/// says nothing about theirs.
+UniqueFd openServicesRoot() {
+    const char* root = geteuid() == 0 && systemdKeepsSupervisors() ? "/proc/1/root" : "/";
+    return UniqueFd(open(root, O_PATH | O_DIRECTORY | O_CLOEXEC));
 }
 
 Error cannotAsk(const std::string& path, const char* why) {
@@ -48,8 +82,12 @@ Result<Access> folderAccess(const std::string& path, const Identity& who) {
     if (who.gids.empty()) {
         return cannotAsk(path, "the account has no group");
     }
+    const UniqueFd root = openServicesRoot();
+    if (!root) {
+        return cannotAsk(path, std::strerror(errno));
+    }
     VELT_ASSIGN_OR_RETURN(const int answer,
-                          askChild([&] { return askKernel(path.c_str(), who, changeIdentity); }));
+                          askChild([&] { return askKernel(root.get(), path.c_str(), who, changeIdentity); }));
     if (answer == cannotTell) {
         return cannotAsk(path, "cannot switch to the account");
     }

@@ -127,8 +127,29 @@ bool SlowTransfer::succeeds() {
     return whole;
 }
 
+void installAndEnableHost() {
+    const ProcessResult installed =
+        runProcess({VELT_CMAKE, "--install", VELT_BUILT_FOLDER, "--prefix", "/usr/local"}, {}, seconds(60));
+    ASSERT_EQ(installed.exitCode, 0) << installed.errors;
+    ASSERT_EQ(runProcess({"systemd-sysusers"}).exitCode, 0);
+    ASSERT_EQ(runProcess({"systemctl", "daemon-reload"}).exitCode, 0);
+    ASSERT_EQ(runProcess({"systemctl", "enable", "--now", "veltd"}).exitCode, 0);
+}
+
+bool hostAnswers() {
+    return waitUntil(
+        [] {
+            return runProcess({"/usr/local/bin/veltctl", "status"}).exitCode == 0;
+        },
+        seconds(10));
+}
+
+ProcessResult runSftp(int atPort, const std::string& commands) {
+    return runProcess(sftpArguments(atPort, {}), commands, seconds(15));
+}
+
 ProcessResult logInBySftp(int atPort) {
-    return runProcess(sftpArguments(atPort, {}), "pwd\n", seconds(15));
+    return runSftp(atPort, "pwd\n");
 }
 
 } // namespace velt::test

@@ -66,6 +66,15 @@ private:
     std::thread client_;
 };
 
+/// Installs all, as an administrator does who has built it, and has the host started now and at each boot.
+void installAndEnableHost();
+
+/// Whether the host answers soon. From then on it has started what is enabled.
+bool hostAnswers();
+
+/// alice logs in over SFTP and does this; the first command that fails ends it.
+ProcessResult runSftp(int atPort, const std::string& commands);
+
 /// alice logs in over SFTP, to the service or to another server, and asks where she is.
 ProcessResult logInBySftp(int atPort);
 
