@@ -11,7 +11,8 @@ std::string escapeControls(std::string_view text, unsigned char c0End, const std
     std::string result;
     for (std::size_t i = 0; i < text.size(); ++i) {
         const auto byte = static_cast<unsigned char>(text[i]);
-        const bool c1 = byte == 0xC2 && i + 1 < text.size() && static_cast<unsigned char>(text[i + 1]) < 0xA0;
+        const auto next = i + 1 < text.size() ? static_cast<unsigned char>(text[i + 1]) : 0;
+        const bool c1 = byte == 0xC2 && next >= 0x80 && next < 0xA0;
         if (c1) {
             result += prefix + hexadecimal({&text[++i], 1});
         } else if (byte < c0End || byte == 0x7F) {

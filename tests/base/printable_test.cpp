@@ -14,6 +14,14 @@ TEST(Printable, ControlCharactersCannotReachATerminal) {
     EXPECT_EQ(printable("\xC2\xA0"), "\xC2\xA0");
 }
 
+TEST(Printable, HalfACharacterTakesNoOtherAlong) {
+    EXPECT_EQ(printable("\xC2"
+                        "A\xC2"),
+              "\xC2"
+              "A\xC2");
+    EXPECT_EQ(printable("\xC2\x1b["), "\xC2\\x1b[");
+}
+
 TEST(Printable, JsonStaysJson) {
     EXPECT_EQ(printableJson("\"a\\n\x7f\xC2\x9B\xC2\xA0\"\n"), "\"a\\n\\u007f\\u009b\xC2\xA0\"\n");
 }
