@@ -2,6 +2,7 @@
 #include "tests/support/handler_test.h"
 
 #include <ctime>
+#include <ostream>
 
 namespace {
 
@@ -16,6 +17,11 @@ struct Method {
     std::string failure;
     bool answersWithNames;
 };
+
+/// For GoogleTest, which would show its bytes, those between its members among them.
+std::ostream& operator<<(std::ostream& stream, const Method& method) {
+    return stream << method.operation;
+}
 
 const Method addition = {FTPChrootUserAdd, "VELTFTPAddChrootUser", "0x11B00024",
                          "Failed to add chroot users.", true};
