@@ -1,4 +1,4 @@
-// What nobody changes over FTP: the files of a home that log-ins, mail and shells obey, and system folders.
+// What nobody changes over FTP: the files of a home that logins, mail and shells obey, and system folders.
 #include "tests/support/files.h"
 #include "tests/support/text.h"
 #include "tests/system/support/shared_folders.h"

@@ -31,11 +31,13 @@ protected:
     }
     login_end logIn(const std::string& program, bool knowsUser = true, bool knowsGroups = true,
                     int code = 0) {
-        const login_world world{program.c_str(), folder_.path().c_str(), knowsUser, knowsGroups, code};
+        const login_world world{program.c_str(), folder_.path().c_str(), knowsUser, knowsGroups, code,
+                                home_.c_str()};
         return log_in(&world);
     }
 
     TemporaryFolder folder_;
+    std::string home_ = "/home/alice";
 };
 
 TEST_F(LoginModule, handsWhatTheDaemonKnowsToTheProgram) {
@@ -68,6 +70,27 @@ TEST_F(LoginModule, refusesWhomTheDaemonCannotTell) {
     EXPECT_EQ(logIn(program, false, true), login_wrong);
 }
 
+TEST_F(LoginModule, refusesWhoseHomeCannotBeLookedAt) {
+    const auto program = script("exit 0\n");
+    home_ = folder_.path() / "home";
+    EXPECT_EQ(logIn(program), login_granted) << "there is none";
+    std::filesystem::create_directory_symlink("home", home_);
+    EXPECT_EQ(logIn(program), login_wrong);
+    EXPECT_NE(std::string(logged()).find("cannot look at the home: "), std::string::npos) << logged();
+    EXPECT_EQ(rights_taken(), 0);
+}
+
+TEST_F(LoginModule, keepsTheFilesOfTheHome) {
+    home_ = folder_.path();
+    const std::string profile = folder_.path() / ".profile";
+    ASSERT_EQ(logIn(script("")), login_granted);
+    EXPECT_LT(open_as_the_daemon(profile.c_str(), O_WRONLY | O_CREAT), 0);
+    EXPECT_EQ(errno, EACCES);
+    home_ = folder_.path() / "another";
+    ASSERT_EQ(logIn(script("")), login_granted);
+    EXPECT_TRUE(UniqueFd(open_as_the_daemon(profile.c_str(), O_WRONLY | O_CREAT)));
+}
+
 TEST_F(LoginModule, doesNothingForAWrongPassword) {
     EXPECT_EQ(logIn(script("touch \"$1/ran\"\n"), true, true, -1), login_wrong);
     EXPECT_FALSE(std::filesystem::exists(folder_.path() / "ran"));
@@ -75,7 +98,7 @@ TEST_F(LoginModule, doesNothingForAWrongPassword) {
 
 TEST_F(LoginModule, endsASessionThatChangesItsRootWithoutIt) {
     const auto program = script("exit 0\n");
-    const login_world world{program.c_str(), folder_.path().c_str(), 1, 1, 0};
+    const login_world world{program.c_str(), folder_.path().c_str(), 1, 1, 0, home_.c_str()};
     EXPECT_EQ(change_root_unasked(&world), login_disconnected);
 }
 

@@ -70,10 +70,9 @@ const char* pr_gid2str(pool* p, gid_t gid) {
 
 struct passwd* pr_auth_getpwnam(pool* p, const char* name) {
     static struct passwd account;
-    static char home[] = "/home/alice";
     (void)p;
     account.pw_name = (char*)name;
-    account.pw_dir = home;
+    account.pw_dir = (char*)world->home;
     account.pw_uid = 1001;
     account.pw_gid = 1001;
     return world->knows_user ? &account : NULL;

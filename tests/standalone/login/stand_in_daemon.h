@@ -8,6 +8,7 @@ struct login_world {
     int knows_user;
     int knows_groups;
     int code; /* what the daemon says of the password; negative: wrong */
+    const char* home;
 };
 
 enum login_end {
