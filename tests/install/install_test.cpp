@@ -72,6 +72,7 @@ TEST_F(Installation, holdsTheseFilesAndNoOthers) {
         "share/doc/velt/firewall.md",
         "share/doc/velt/openapi.json",
         "share/doc/velt/operations.md",
+        "share/doc/velt/security.md",
         "share/man/man1/veltctl.1",
         "share/man/man8/veltd.8",
         "share/velt/known_services.conf",
