@@ -15,8 +15,6 @@ void writeToStandardError(const std::string& line) {
     std::fwrite(whole.data(), 1, whole.size(), stderr);
 }
 
-constexpr unsigned refusalsPerSecond = 10;
-
 } // namespace
 
 HostLog::HostLog() : HostLog(writeToStandardError) {}
@@ -33,23 +31,10 @@ void HostLog::write(std::string_view requestId, std::string_view text) {
     write("request=" + std::string(requestId) + " " + std::string(text));
 }
 
-std::optional<std::size_t> HostLog::admitRefusal() {
-    const auto now = std::chrono::steady_clock::now();
-    const std::lock_guard lock(mutex_);
-    if (now - second_ >= std::chrono::seconds(1)) {
-        second_ = now;
-        refusals_ = 0;
-    }
-    if (refusals_ == refusalsPerSecond) {
-        ++leftOut_;
-        return std::nullopt;
-    }
-    ++refusals_;
-    return std::exchange(leftOut_, 0);
-}
-
 void HostLog::writeRefusal(std::string_view requestId, std::string_view text) {
-    const auto leftOut = admitRefusal();
+    std::unique_lock lock(mutex_);
+    const auto leftOut = refusals_.admit();
+    lock.unlock();
     if (!leftOut) {
         return;
     }

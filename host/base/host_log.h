@@ -2,11 +2,11 @@
 #ifndef VELT_HOST_BASE_HOST_LOG_H
 #define VELT_HOST_BASE_HOST_LOG_H
 
+#include "base/rate_limit.h"
+
 #include <chrono>
-#include <cstddef>
 #include <functional>
 #include <mutex>
-#include <optional>
 #include <string>
 #include <string_view>
 
@@ -32,14 +32,9 @@ public:
     void writeRefusal(std::string_view requestId, std::string_view text);
 
 private:
-    /// How many refusals were left out before this one; nothing when it is to be left out, too.
-    std::optional<std::size_t> admitRefusal();
-
     std::mutex mutex_;
     Sink sink_;
-    std::chrono::steady_clock::time_point second_; ///< the beginning of the current one
-    unsigned refusals_ = 0;                        ///< written in it
-    std::size_t leftOut_ = 0;                      ///< refusals since the last that was written
+    RateLimit refusals_{10, std::chrono::seconds(1)};
 };
 
 } // namespace velt::host

@@ -121,13 +121,24 @@ void DaemonProcess::readOutput() {
     }
 }
 
+void DaemonProcess::log(const std::string& line) {
+    const auto leftOut = logged_.admit();
+    if (!leftOut) {
+        return;
+    }
+    if (*leftOut > 0) {
+        ::syslog(LOG_WARNING, "%zu lines before the next one are not logged", *leftOut);
+    }
+    ::syslog(LOG_NOTICE, "%s", line.c_str());
+}
+
 void DaemonProcess::takeLine(std::string line) {
     // The lines reach state files, logs and answers; remove control characters.
     std::erase_if(line, isControl);
     if (line.empty()) {
         return;
     }
-    ::syslog(LOG_NOTICE, "%s", line.c_str());
+    log(line);
     lastLines_.push_back(std::move(line));
     if (lastLines_.size() > keptLines) {
         lastLines_.pop_front();

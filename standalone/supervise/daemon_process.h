@@ -3,6 +3,7 @@
 #define VELT_STANDALONE_SUPERVISE_DAEMON_PROCESS_H
 
 #include "base/pipe.h"
+#include "base/rate_limit.h"
 #include "base/result.h"
 #include "standalone/process/process_identity.h"
 #include "standalone/supervise/daemon_order.h"
@@ -22,7 +23,8 @@ public:
     DaemonProcess();
 
     /// Starts the daemon and waits until it listens. On failure the daemon is gone, and the error is its own
-    /// last words where it has some. All that it writes goes to syslog.
+    /// last words where it has some. What it writes goes to syslog, but no more than 600 lines a minute,
+    /// since strangers can make it write; a line tells how many are missing.
     Result<> start(const DaemonOrder& order, Clock::time_point deadline);
 
     /// The running daemon; no process before a start and after ended().
@@ -40,10 +42,12 @@ private:
     Result<> waitUntilListening(const DaemonOrder& order, Clock::time_point deadline);
     std::string takeLastWords();
     void takeLine(std::string line);
+    void log(const std::string& line);
 
     Pipe output_; ///< with its write end, so that the read end never sees an end of file
     ProcessId id_;
     std::string partialLine_;
+    RateLimit logged_{600, std::chrono::minutes(1)};
     std::deque<std::string> lastLines_;
 };
 

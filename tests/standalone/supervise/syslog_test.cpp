@@ -18,6 +18,8 @@
 #include <array>
 #include <cstring>
 #include <fstream>
+#include <string>
+#include <thread>
 
 namespace velt::test {
 namespace {
@@ -44,6 +46,16 @@ public:
 
     bool isThere() const { return isThere_; }
 
+    /// How many lines come that hold the text, until none comes for a while.
+    int linesWith(const std::string& text) const {
+        int count = 0;
+        std::array<char, 1024> line{};
+        for (ssize_t size = 0; (size = ::recv(socket_.get(), line.data(), line.size(), 0)) > 0;) {
+            count += std::string(line.data(), static_cast<std::size_t>(size)).find(text) != std::string::npos;
+        }
+        return count;
+    }
+
     /// The next line that holds the text; "" when none comes.
     std::string lineWith(const std::string& text) const {
         std::array<char, 1024> line{};
@@ -66,16 +78,29 @@ protected:
     /// The line with `sign` that the supervisor of this daemon writes when it says the words; found
     /// in a child, whose "/dev" goes with it.
     std::string lineOf(const Daemon& daemon, const std::string& words, const std::string& sign) const {
-        const std::filesystem::path told = root_ / "line";
+        return told(daemon, words, [&](const OwnLog& log) { return log.lineWith(sign); });
+    }
+
+    /// How many lines with `sign` it writes.
+    std::string countOf(const Daemon& daemon, const std::string& words, const std::string& sign) const {
+        return told(daemon, words, [&](const OwnLog& log) { return std::to_string(log.linesWith(sign)); });
+    }
+
+private:
+    template<class Listen>
+    std::string told(const Daemon& daemon, const std::string& words, Listen&& listen) const {
+        const std::filesystem::path file = root_ / "line";
         const pid_t child = ::fork();
         if (child == 0) {
             const OwnLog log(root_ / "dev");
             if (!log.isThere()) {
                 ::_exit(77);
             }
+            // Beside the start, which waits as long as nobody takes the lines.
+            std::thread listener([&] { std::ofstream(file) << listen(log); });
             SupervisedDaemon supervised(daemon);
             (void)supervised.start(testOrder(freePort(), "one", {"--refuse", words}));
-            std::ofstream(told) << log.lineWith(sign);
+            listener.join();
             ::_exit(0);
         }
         int status = -1;
@@ -84,7 +109,7 @@ protected:
             return "skip";
         }
         std::string line;
-        std::getline(std::ifstream(told), line);
+        std::getline(std::ifstream(file), line);
         return line;
     }
 };
@@ -108,6 +133,18 @@ TEST_F(SyslogTest, NoWordForgesALineOrAFormat) {
         GTEST_SKIP() << "no mount name space can be made here";
     }
     EXPECT_TRUE(line.ends_with("]: 50%n [2Jvelt-ftpd[1]: forged")) << line;
+}
+
+TEST_F(SyslogTest, StrangersDoNotFillIt) {
+    std::string words;
+    for (int i = 0; i < 1000; ++i) {
+        words += "a login\n";
+    }
+    const std::string count = countOf(ftpDaemon, words, "a login");
+    if (count == "skip") {
+        GTEST_SKIP() << "no mount name space can be made here";
+    }
+    EXPECT_EQ(count, "600");
 }
 
 } // namespace
