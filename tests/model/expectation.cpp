@@ -24,7 +24,19 @@ public:
     Expectation changeMode(const std::string& path, const std::string& mode) const;
 
 private:
-    bool mayChange(const Target& target) const { return paths_.lets(target.folder, toWrite | toEnter); }
+    bool isObeyed(const Spot& spot) const {
+        return model::isObeyed(account_, spot.place, paths_.rootOf(spot));
+    }
+    bool mayChange(const Target& target) const {
+        const std::string place = join(target.folder.place, target.name);
+        return !isObeyed({target.folder.mount, place}) && place != account_.home &&
+               paths_.lets(target.folder, toWrite | toEnter);
+    }
+    bool mayWrite(const Target& target) const {
+        return target.reached == Reached::nothing
+                   ? mayChange(target)
+                   : paths_.lets(target.spot, toWrite) && !isObeyed(target.spot);
+    }
     Expectation withNew(const Target& target, Kind kind, const std::string& text) const;
     Expectation without(const Target& target) const;
     Expectation renameWithin(const Target& source, const Target& target) const;
@@ -77,6 +89,9 @@ Expectation Oracle::list(const std::string& path) const {
         const Node* node = target.reached == Reached::node ? paths_.nodeAt(target.spot) : nullptr;
         return node != nullptr && node->kind == Kind::file ? undecided : listed;
     }
+    if (target.throughLink) {
+        return undecided;
+    }
     if (!paths_.lets(target.spot, toRead)) {
         return refused;
     }
@@ -100,10 +115,10 @@ Expectation Oracle::write(const std::string& path, bool append) const {
         return undecided;
     }
     if (target.reached == Reached::nothing) {
-        return mayChange(target) ? withNew(target, Kind::file, data_) : refused;
+        return mayWrite(target) ? withNew(target, Kind::file, data_) : refused;
     }
     const Node* node = target.reached == Reached::node ? paths_.nodeAt(target.spot) : nullptr;
-    if (node == nullptr || node->kind != Kind::file || !paths_.lets(target.spot, toWrite)) {
+    if (node == nullptr || node->kind != Kind::file || !mayWrite(target)) {
         return refused;
     }
     Tree after = tree_;
@@ -182,16 +197,24 @@ Expectation Oracle::renameWithin(const Target& source, const Target& target) con
     return allowed(std::move(after));
 }
 
-// Between two mounts a server copies, or refuses.
+// Between two mounts a server copies files, and refuses the rest.
 Expectation Oracle::copy(const Target& source, const Target& target) const {
     const Node* node = paths_.nodeAt(source.spot);
-    const bool mayRead = node != nullptr && node->kind == Kind::file && paths_.lets(source.spot, toRead);
-    const bool isNew = target.reached == Reached::nothing;
-    const bool mayWrite = isNew ? mayChange(target) : paths_.lets(target.spot, toWrite);
-    if (mayRead && mayWrite) {
+    if (node == nullptr || node->kind == Kind::folder) {
+        return refused;
+    }
+    if (node->kind == Kind::link) {
         return undecided;
     }
-    return node != nullptr && node->kind == Kind::link ? undecided : refused;
+    if (!paths_.lets(source.spot, toRead) || !mayChange(source) || !mayWrite(target)) {
+        return refused;
+    }
+    if (target.reached != Reached::nothing) {
+        return undecided;
+    }
+    Expectation copied = withNew(target, Kind::file, node->text);
+    copied.after->nodes.erase(source.spot.place);
+    return copied;
 }
 
 Expectation Oracle::changeMode(const std::string& path, const std::string& mode) const {
@@ -201,7 +224,7 @@ Expectation Oracle::changeMode(const std::string& path, const std::string& mode)
     }
     const Node* node = target.reached == Reached::node ? paths_.nodeAt(target.spot) : nullptr;
     if (node == nullptr || node->owner != account_.uid || account_.name == "ftp" ||
-        paths_.accessOf(target.spot) != Access::write) {
+        paths_.accessOf(target.spot) != Access::write || isObeyed(target.spot)) {
         return refused;
     }
     Tree after = tree_;

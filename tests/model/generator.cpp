@@ -9,6 +9,10 @@ const std::vector<std::string> users{"alice", "bob", "carol"};
 const std::vector<std::string> shareNames{"one", "two", "three", "four"};
 const std::vector<std::string> sessionNames{"s1", "s2", "s3", "s4"};
 
+bool isDeeper(const std::string& one, const std::string& other) {
+    return std::ranges::count(one, '/') < std::ranges::count(other, '/');
+}
+
 } // namespace
 
 std::string Generator::name() {
@@ -16,7 +20,7 @@ std::string Generator::name() {
 }
 
 std::string Generator::mode() {
-    return chance(75) ? "777" : anyOf({"755", "700", "750", "770", "711", "555"});
+    return chance(82) ? "777" : anyOf({"755", "700", "750", "770", "711", "555"});
 }
 
 std::string Generator::owner() {
@@ -43,6 +47,9 @@ Step Generator::share(const std::string& name) {
     if (chance(85)) {
         path = oneOf(folders_);
     }
+    if (chance(50)) {
+        path = std::max(path, oneOf(folders_), isDeeper);
+    }
     Step step{"share", name, path};
     for (const char* user : {"alice", "bob", "carol", "ftp"}) {
         if (chance(70)) {
@@ -66,10 +73,10 @@ Step Generator::share(const std::string& name) {
 Step Generator::rules() {
     Step step{"rules"};
     for (const char* who : {"alice", "bob", "@staff", "@velt-admin"}) {
-        if (chance(25)) {
+        if (chance(35)) {
             std::string path = chance(30) ? "/home" : "/" + oneOf(shareNames);
             for (int more = below(3); more > 0 && path != "/home"; more--) {
-                path += "/" + name();
+                path += "/" + (chance(50) ? "l" : name());
             }
             step.push_back(who + ("=" + path));
         }
@@ -96,6 +103,11 @@ void Generator::addFolders(Steps& steps) {
             steps.push_back({"folder", folder, owner(), mode()});
         }
     }
+    if (chance(30)) {
+        steps.push_back({"folder", "/mnt/home/alice/.ssh", "alice", "777"});
+        steps.push_back({"file", "/mnt/home/alice/.ssh/f", "alice", "666"});
+        steps.push_back({"file", "/mnt/home/alice/.profile", "alice", "666"});
+    }
     for (const std::string& folder : folders_) {
         if (chance(80)) {
             steps.push_back(
@@ -116,14 +128,16 @@ Steps Generator::world() {
         steps.push_back({"link", join(oneOf(folders_), anyOf({"l", "l", "a", "inner"})), target()});
     }
     for (const std::string& one : shareNames) {
-        if (chance(80)) {
+        if (one == shareNames[0] && chance(70)) {
+            steps.push_back({"share", one, folders_[0], "alice=write", "bob=" + grant(), "ftp=" + grant()});
+        } else if (chance(80)) {
             steps.push_back(share(one));
         }
-        if (one == shareNames[0] && chance(60)) {
-            steps.back() = {"share", one, folders_[0], "alice=write", "bob=" + grant(), "ftp=" + grant()};
-        }
     }
-    if (chance(30)) {
+    if (const Step last = steps.back(); last[0] == "share" && chance(40)) {
+        steps.push_back({"link", join(last[2], "l"), target()});
+        steps.push_back({"rules", "alice=/" + last[1] + "/l", "@staff=/" + last[1]});
+    } else if (chance(40)) {
         steps.push_back(rules());
     }
     if (chance(50)) {
@@ -152,6 +166,18 @@ std::string Generator::placeIn(const Tree& tree) {
     return oneOf(all);
 }
 
+// The folder of a share or one on the way to it.
+std::string Generator::placeOfNote(const World& world) {
+    if (world.shares.empty()) {
+        return folderIn(world.tree);
+    }
+    std::string place = walk(world.tree, oneOf(world.shares).path).path;
+    for (int up = below(3); up > 0 && parentOf(place).size() > sizeof "/mnt/home"; up--) {
+        place = parentOf(place);
+    }
+    return place;
+}
+
 std::string Generator::viewPath(const Runner& runner, const Session& session, bool folder) {
     const Tree& tree = runner.world().tree;
     if (chance(3)) {
@@ -160,7 +186,9 @@ std::string Generator::viewPath(const Runner& runner, const Session& session, bo
     for (int attempt = 0; attempt < 20 && !session.view.mounts.empty(); attempt++) {
         const Mount& mount = oneOf(session.view.mounts);
         const std::string root = tree.placeOf(mount.folder);
-        const std::string place = folder || chance(25) ? folderIn(tree) : placeIn(tree);
+        const std::string place = chance(35)             ? placeOfNote(runner.world())
+                                  : folder || chance(25) ? folderIn(tree)
+                                                         : placeIn(tree);
         if (mount.parent < 0 && !root.empty() && isWithin(place, root)) {
             const std::string path = (mount.name.empty() ? "" : "/" + mount.name) + place.substr(root.size());
             return path.empty() ? "/" : path;
@@ -193,7 +221,7 @@ Step Generator::inShell(const Runner& runner) {
     const Tree& tree = runner.world().tree;
     const std::string user = oneOf(users);
     const std::string fresh = join(folderIn(tree), name());
-    const std::string place = placeIn(tree);
+    const std::string place = chance(40) ? placeOfNote(runner.world()) : placeIn(tree);
     switch (below(10)) {
     case 0:
     case 1:
@@ -218,11 +246,38 @@ Step Generator::logIn(const std::string& session) {
     return {"login", session, anyOf({"alice", "alice", "alice", "bob", "bob", "carol", "ftp"})};
 }
 
+// The path of what is mounted in another mount, as an attacker would try to get rid of it; "" when nothing
+// is.
+std::string Generator::mountedPath(const Runner& runner, const View& view) {
+    std::vector<const Mount*> inner;
+    for (const Mount& mount : view.mounts) {
+        if (mount.parent >= 0) {
+            inner.push_back(&mount);
+        }
+    }
+    if (inner.empty()) {
+        return "";
+    }
+    const Mount* outer = oneOf(inner);
+    const std::string place = runner.world().tree.placeOf(outer->folder);
+    while (outer->parent >= 0) {
+        outer = &view.mounts[static_cast<std::size_t>(outer->parent)];
+    }
+    const std::string root = runner.world().tree.placeOf(outer->folder);
+    const bool within = !root.empty() && isWithin(place, root);
+    return within ? (outer->name.empty() ? "" : "/" + outer->name) + place.substr(root.size()) : "";
+}
+
 Step Generator::ask(const Runner& runner) {
     const auto& [name, session] = oneOf(runner.sessions());
+    const std::string mounted = chance(15) ? mountedPath(runner, session.view) : "";
+    if (!mounted.empty()) {
+        return chance(80) ? Step{"rename", name, mounted, join(parentOf(mounted), this->name())}
+                          : Step{"remove-folder", name, mounted};
+    }
     const std::string path = viewPath(runner, session, false);
     const std::string around = viewPath(runner, session, true);
-    const std::string fresh = join(around, this->name());
+    const std::string fresh = join(around, chance(5) ? anyOf({".ssh", ".profile"}) : this->name());
     switch (below(16)) {
     case 0:
         return {"enter", name, path};
@@ -274,10 +329,7 @@ void Generator::attack(const Runner& runner) {
     if (shares.empty()) {
         return;
     }
-    std::string way = walk(runner.world().tree, oneOf(shares).path).path;
-    for (int up = below(2); up > 0 && way.size() > sizeof "/mnt/srv/outer"; up--) {
-        way = parentOf(way);
-    }
+    const std::string way = placeOfNote(runner.world());
     if (!isWithin(way, "/mnt/srv") && !isWithin(way, "/mnt/home")) {
         return;
     }

@@ -41,7 +41,10 @@ private:
     // Of what is there.
     std::string folderIn(const Tree& tree);
     std::string placeIn(const Tree& tree);
+    std::string placeOfNote(const World& world);
     std::string viewPath(const Runner& runner, const Session& session, bool folder);
+
+    std::string mountedPath(const Runner& runner, const View& view);
 
     Step administer(const Runner& runner);
     Step inShell(const Runner& runner);

@@ -27,6 +27,9 @@ private:
     /// The access limited by the shares at and above the place that lie strictly within `outer`.
     Access leastWithin(const std::string& place, const std::string& outer, Access access) const;
     bool missesOneWithin(const std::string& place) const;
+    bool mayEnter(const std::string& place) const {
+        return modesLet(account_, *world_.tree.at(place), toEnter);
+    }
     std::optional<std::string> ruledPath() const;
 
     std::optional<View> home() const;
@@ -132,16 +135,16 @@ std::optional<View> Policy::home() const {
         return std::nullopt;
     }
     const Access access = leastWithin(place.path, parentOf(place.path), Access::write);
-    if (access == Access::none) {
+    if (access == Access::none || !mayEnter(place.path)) {
         return std::nullopt;
     }
     View view;
     mount(view, {-1, 0, "", world_.tree.at(place.path)->id, access}, place.path);
-    view.limits.push_back({world_.tree.at(place.path)->id, access});
+    view.limits.push_back({world_.tree.at(place.path)->id, place.path, access});
     for (const Place& inner : places_) {
         if (inner.found && isStrictlyWithin(inner.path, place.path)) {
             const Access least = leastWithin(inner.path, place.path, access);
-            view.limits.push_back({world_.tree.at(inner.path)->id, least});
+            view.limits.push_back({world_.tree.at(inner.path)->id, inner.path, least});
         }
     }
     return view;
@@ -163,7 +166,7 @@ std::optional<View> Policy::inShare(const std::string& path) const {
         return std::nullopt;
     }
     const Access access = leastWithin(*folder, place.path, on(number));
-    if (access == Access::none) {
+    if (access == Access::none || !mayEnter(*folder)) {
         return std::nullopt;
     }
     View view;
@@ -225,7 +228,7 @@ void Policy::mount(View& view, Mount shown, const std::string& place) const {
 void Policy::addLimits(View& view) const {
     for (std::size_t i = 0; i < places_.size(); i++) {
         if (places_[i].found) {
-            view.limits.push_back({world_.tree.at(places_[i].path)->id, on(i)});
+            view.limits.push_back({world_.tree.at(places_[i].path)->id, places_[i].path, on(i)});
         }
     }
 }
@@ -259,19 +262,29 @@ std::optional<View> viewOf(const World& world, const Account& account) {
     return Policy(world, account).view();
 }
 
+// Those of the documented names that are used here.
+bool isObeyed(const Account& account, const std::string& place, const std::string& root) {
+    return std::ranges::any_of(std::initializer_list<const char*>{".ssh", ".profile"}, [&](const char* name) {
+        const std::string obeyed = join(account.home, name);
+        return isWithin(place, obeyed) && !isStrictlyWithin(root, obeyed);
+    });
+}
+
 bool mayReach(const Tree& tree, const View& view, const std::string& place, Access access) {
     for (std::string folder = place;; folder = parentOf(folder)) {
         const Node* node = tree.at(folder);
-        Access best = Access::none;
-        bool limited = false;
+        bool limited = folder == "/";
         for (const Limit& limit : view.limits) {
-            if (node != nullptr && limit.folder == node->id) {
-                best = std::max(best, limit.access);
-                limited = true;
+            if (node == nullptr || limit.folder != node->id) {
+                continue;
             }
+            if (limit.access >= access) {
+                return true;
+            }
+            limited = limited || limit.place == folder;
         }
-        if (limited || folder == "/") {
-            return best >= access;
+        if (limited) {
+            return false;
         }
     }
 }

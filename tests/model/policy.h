@@ -58,6 +58,7 @@ struct Mount {
 /// What a share, or the home, gave the user when he logged in.
 struct Limit {
     std::uint64_t folder = 0;
+    std::string place; ///< where it was
     Access access = Access::none;
 };
 
@@ -70,8 +71,14 @@ struct View {
 /// Nothing when the login is refused.
 std::optional<View> viewOf(const World& world, const Account& account);
 
+/// Whether log-ins and shells obey what is at the place, in this user's home: the service changes nothing
+/// there. `root` is the folder that is shown; if it lies deeper than what is obeyed, the administrator opened
+/// just that.
+bool isObeyed(const Account& account, const std::string& place, const std::string& root);
+
 /// Whether such a view may ever lead to this place with this access, whatever was done since: the innermost
-/// share or home around it must have given that much. Says less than the mounts do, and depends on less.
+/// share or home around it must have given that much. One that was moved since goes on giving, and takes
+/// nothing from what is around it now. Says less than the mounts do, and depends on less.
 bool mayReach(const Tree& tree, const View& view, const std::string& place, Access access);
 
 } // namespace velt::model

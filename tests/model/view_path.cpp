@@ -1,5 +1,7 @@
 #include "tests/model/view_path.h"
 
+#include <algorithm>
+
 namespace velt::model {
 namespace {
 
@@ -17,6 +19,16 @@ Spot ViewPaths::root() const {
 
 Access ViewPaths::accessOf(const Spot& spot) const {
     return isSideBySide(spot) ? Access::read : view_.mounts.at(static_cast<std::size_t>(spot.mount)).access;
+}
+
+std::string ViewPaths::rootOf(const Spot& spot) const {
+    std::uint64_t folder = 0;
+    for (int mount = spot.mount; mount >= 0;) {
+        const Mount& one = view_.mounts.at(static_cast<std::size_t>(mount));
+        folder = one.folder;
+        mount = one.parent;
+    }
+    return tree_.placeOf(folder);
 }
 
 std::set<std::string> ViewPaths::namesIn(const Spot& spot) const {
@@ -70,6 +82,10 @@ Target ViewPaths::step(const Spot& folder, const std::string& name) const {
         return target;
     }
     target.reached = node != nullptr ? Reached::node : Reached::nothing;
+    // The kernel keeps it where it is even when it was moved to where the mount does not show.
+    target.isMountPoint = node != nullptr && std::ranges::any_of(view_.mounts, [node](const Mount& mount) {
+                              return mount.over != 0 && mount.over == node->id;
+                          });
     target.spot = {folder.mount, node != nullptr ? join(folder.place, name) : ""};
     return target;
 }

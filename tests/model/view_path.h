@@ -38,6 +38,8 @@ public:
     Access accessOf(const Spot& spot) const;
     /// Nothing for the root that shows shares side by side.
     const Node* nodeAt(const Spot& spot) const { return tree_.at(spot.place); }
+    /// The place of the outermost folder in which it is shown.
+    std::string rootOf(const Spot& spot) const;
     std::set<std::string> namesIn(const Spot& spot) const;
     bool lets(const Spot& spot, unsigned bits) const;
 
