@@ -66,7 +66,8 @@ Spot ViewPaths::mountedAt(int mount, const std::string& name, std::uint64_t over
 
 Target ViewPaths::step(const Spot& folder, const std::string& name) const {
     Target target{Reached::barred, {}, folder, name};
-    if (!lets(folder, toEnter)) {
+    const bool isFolder = isSideBySide(folder) || tree_.isFolder(folder.place);
+    if (!isFolder || !lets(folder, toEnter)) {
         return target;
     }
     const Node* node = isSideBySide(folder) ? nullptr : tree_.at(join(folder.place, name));
