@@ -1,7 +1,7 @@
 // The kept cases and random worlds, by a real daemon and by the model.
 //
 // VELT_MODEL_SEED, VELT_MODEL_STEPS, VELT_MODEL_MINUTES: the first seed, and how much is tried at least.
-// VELT_MODEL_CASES: a file of other cases.
+// VELT_MODEL_CASES: a file of other cases. A seed that was printed is tried again as the first one of part 0.
 #include "tests/model/generator.h"
 #include "tests/support/files.h"
 #include "tests/system/support/files.h"

@@ -223,6 +223,10 @@ void RealWorld::layDown(const Step& step, const std::string& data) const {
 }
 
 void RealWorld::inShell(const Step& step, const std::string& data) const {
+    static const std::set<std::string> known{"mkdir", "ln", "mv", "rm", "rmdir", "chmod", "write"};
+    if (!known.contains(step.at(2)) || step.size() < 4) {
+        throw std::invalid_argument("a shell knows nothing like " + formatStep(step));
+    }
     const Account& account = accountOf(step.at(1));
     const pid_t child = fork();
     if (child == 0) {

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <exception>
+#include <stdexcept>
 
 namespace velt::model {
 namespace {
@@ -14,6 +15,12 @@ Access accessNamed(const std::string& word) {
 
 Listing listingNamed(const std::string& verb) {
     return verb == "list" ? Listing::list : verb == "names" ? Listing::names : Listing::facts;
+}
+
+bool isAsked(const std::string& verb) {
+    static const std::set<std::string> verbs{"enter",  "list", "names",  "facts",         "read",   "write",
+                                             "append", "make", "remove", "remove-folder", "rename", "chmod"};
+    return verbs.contains(verb);
 }
 
 Outcome doStep(Client& client, const Step& step, const std::string& data) {
@@ -56,15 +63,19 @@ std::string Runner::perform(const Step& step) {
     if (verb == "login") {
         return logIn(step);
     }
-    const auto session = step.size() > 1 ? sessions_.find(step[1]) : sessions_.end();
     if (verb == "logout") {
         logOut(step.at(1));
         return "";
     }
-    return session != sessions_.end() ? ask(step, session->second) : administer(step);
+    if (!isAsked(verb)) {
+        administer(step);
+        return "";
+    }
+    const auto session = sessions_.find(step.at(1));
+    return session != sessions_.end() ? ask(step, session->second) : "";
 }
 
-std::string Runner::administer(const Step& step) {
+void Runner::administer(const Step& step) {
     const std::string& verb = step[0];
     const std::string data = "#" + std::to_string(++written_) + ";";
     if (verb == "folder" || verb == "file" || verb == "link") {
@@ -81,9 +92,10 @@ std::string Runner::administer(const Step& step) {
     } else if (verb == "switches") {
         const auto [guests, share] = splitPair(step.at(2));
         world_.switches = {step.at(1) == "home", guests == "guests", share};
+    } else {
+        throw std::invalid_argument("there is no step like " + formatStep(step));
     }
     world_.tree = real_.look();
-    return "";
 }
 
 void Runner::setShare(const Step& step) {

@@ -38,7 +38,7 @@ public:
     const Counts& counts() const { return counts_; }
 
 private:
-    std::string administer(const Step& step);
+    void administer(const Step& step);
     void setShare(const Step& step);
     void setRules(const Step& step);
     std::string logIn(const Step& step);
