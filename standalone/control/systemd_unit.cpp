@@ -13,16 +13,17 @@ namespace {
 
 // What neither the daemons nor their sessions need. Sessions work anywhere in homes and shares, which may lie
 // anywhere, and log in by what the machine has: its modules for PAM and for accounts run in the daemons and
-// may limit resources, mount homes or write to the audit log. So these stay as they are on the machine:
+// may make homes (CAP_CHOWN, CAP_DAC_OVERRIDE, CAP_FOWNER, CAP_FSETID) or mount them, limit resources
+// (CAP_SYS_NICE, CAP_SYS_RESOURCE), or write to the audit log. So these stay as they are on the machine:
 // - its files, for writing where modes allow it (ProtectSystem=, ProtectHome=, PrivateTmp=);
-// - set-group-id folders (RestrictSUIDSGID=; ProFTPD's sessions get no such bits by our module);
+// - set-group-id folders (RestrictSUIDSGID=, which refuses openat2 as well, as the view of a login needs it;
+//   over FTP our module keeps such bits from everybody);
 // - code that is made at run time, as some modules do (MemoryDenyWriteExecute=);
 // - the right to mount, for the views of sessions (CAP_SYS_ADMIN, @mount).
 constexpr std::string_view restrictions =
     "CapabilityBoundingSet=CAP_AUDIT_WRITE CAP_CHOWN CAP_DAC_OVERRIDE CAP_DAC_READ_SEARCH CAP_FOWNER "
     "CAP_FSETID CAP_KILL CAP_NET_BIND_SERVICE CAP_SETGID CAP_SETUID CAP_SYS_ADMIN CAP_SYS_CHROOT "
-    "CAP_SYS_NICE "
-    "CAP_SYS_PTRACE CAP_SYS_RESOURCE\n"
+    "CAP_SYS_NICE CAP_SYS_PTRACE CAP_SYS_RESOURCE\n"
     "NoNewPrivileges=yes\n"
     "SystemCallFilter=~@clock @cpu-emulation @debug @module @obsolete @raw-io @reboot @swap\n"
     "SystemCallErrorNumber=EPERM\n"

@@ -142,7 +142,7 @@ TEST_F(UnderSystemd, theHostHasNoMoreRightsThanItNeeds) {
     inside([] {
         startHost();
         const std::string host = unitProperty("veltd.service", "MainPID");
-        EXPECT_EQ(statusOf(host, "CapBnd"), rights({CAP_DAC_READ_SEARCH, CAP_SETUID, CAP_SETGID,
+        EXPECT_EQ(statusOf(host, "CapBnd"), rights({CAP_DAC_READ_SEARCH, CAP_SETUID, CAP_SETGID, CAP_KILL,
                                                     CAP_NET_BIND_SERVICE, CAP_NET_ADMIN, CAP_SYS_PTRACE}));
         EXPECT_EQ(statusOf(host, "NoNewPrivs"), "1");
         EXPECT_EQ(statusOf(host, "Seccomp"), "2");
