@@ -8,7 +8,8 @@ namespace {
 using namespace std::string_literals;
 
 TEST(PlainText, AcceptsTextInAnyScript) {
-    for (const char* text : {"", "plain", "Ünïcode", "資料", "\xF0\x9F\x93\x81", "a b\"c'd\\e;f`g$h%i"}) {
+    for (const char* text : {"", "plain", "Ünïcode", "資料", "\xF0\x9F\x93\x81", "\xED\x9F\xBF",
+                             "\xEE\x80\x80", "\xF4\x8F\xBF\xBF", "a b\"c'd\\e;f`g$h%i"}) {
         EXPECT_TRUE(isPlainText(text)) << text;
     }
 }
@@ -23,7 +24,7 @@ TEST(PlainText, RefusesControlCharactersAndLineEnds) {
 TEST(PlainText, RefusesWhatIsNoUtf8) {
     for (const std::string& text :
          {"\xff"s, "\x80"s, "\xC3"s, "\xC3("s, "\xE2\x82"s, "\xC0\xAF"s, "\xE0\x80\xAF"s, "\xED\xA0\x80"s,
-          "\xF4\x90\x80\x80"s, "\xF8\x88\x80\x80\x80"s}) {
+          "\xED\xBF\xBF"s, "\xF4\x90\x80\x80"s, "\xF8\x88\x80\x80\x80"s}) {
         EXPECT_FALSE(isPlainText(text));
     }
 }

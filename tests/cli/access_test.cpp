@@ -98,6 +98,15 @@ TEST_F(AccessTest, ASlowAnswerEndsAtTheTimeout) {
     EXPECT_EQ(run({"status", "--timeout", "0"}).code, 2);
 }
 
+TEST_F(AccessTest, AnAnswerThatIsTooLongIsNotTaken) {
+    HttpReply endless;
+    endless.body = std::string(std::size_t{65} * 1024 * 1024, ' ');
+    host.answerWith("GET /api/status", endless);
+    const RunResult result = run({"status"});
+    EXPECT_EQ(result.code, 6);
+    EXPECT_NE(result.err.find("The answer is too long to be from veltd."), std::string::npos) << result.err;
+}
+
 TEST_F(AccessTest, AProxyOfTheEnvironmentDoesNotSeeTheToken) {
     const RunResult result = runProcess({VELTCTL, "sftp", "get"},
                                         {"VELT_URL=" + server.url(), "VELT_TOKEN=one",

@@ -121,20 +121,30 @@ TEST_F(HostLogPage, ALogThatCannotBeReadIsAFailure) {
     EXPECT_EQ(answer.json()["detail"], "The log cannot be read: disk full.");
 }
 
+/// In milliseconds after 1970.
+std::int64_t read(const char* text) {
+    const auto time = velt::host::parseTimestamp(text).value_or(velt::TimePoint::min());
+    return std::chrono::duration_cast<std::chrono::milliseconds>(time.time_since_epoch()).count();
+}
+
 TEST(Clock, MomentsAreReadInSeveralForms) {
-    using velt::host::parseTimestamp;
-    const auto read = [](const char* text) {
-        const auto time = parseTimestamp(text).value_or(velt::TimePoint::min());
-        return std::chrono::duration_cast<std::chrono::milliseconds>(time.time_since_epoch()).count();
-    };
     EXPECT_EQ(read("1970-01-02"), 86'400'000);
     EXPECT_EQ(read("1970-01-01T00:00:01Z"), 1000);
     EXPECT_EQ(read("1970-01-01T00:00:01.25Z"), 1250);
     EXPECT_EQ(read("12"), 12'000);
     for (const char* text : {"", "x", "1970-01-01T00:00", "1970-01-01T00:00:01+01:00", "-1", "1970-13-01"}) {
-        EXPECT_FALSE(parseTimestamp(text)) << text;
+        EXPECT_FALSE(velt::host::parseTimestamp(text)) << text;
     }
     EXPECT_EQ(velt::timestamp(velt::TimePoint(std::chrono::milliseconds(1'250))), "1970-01-01T00:00:01.250Z");
+}
+
+TEST(Clock, MomentsAreInUtcWhateverTheMachinesZoneIs) {
+    setenv("TZ", "EST5", 1);
+    tzset();
+    EXPECT_EQ(read("1970-01-01T00:00:01Z"), 1000);
+    EXPECT_EQ(read("1970-01-02"), 86'400'000);
+    unsetenv("TZ");
+    tzset();
 }
 
 } // namespace

@@ -6,11 +6,23 @@
 #include "standalone/settings/settings.h"
 #include "tests/standalone/supervise/daemon_test.h"
 
+#include <atomic>
+
 namespace velt::test {
 
 PlanDouble& planDouble() {
     static PlanDouble plan;
     return plan;
+}
+
+namespace {
+
+std::atomic<int> ftpPlansMade{0};
+
+} // namespace
+
+int ftpPlans() {
+    return ftpPlansMade;
 }
 
 namespace {
@@ -40,6 +52,7 @@ Result<std::optional<DaemonPlan>> makePlan(int port, const std::string& settings
 namespace velt {
 
 Result<std::optional<DaemonPlan>> planFtpDaemon() {
+    ++test::ftpPlansMade;
     const auto settings = loadFtpSettings();
     if (!settings) {
         return settings.error();

@@ -16,6 +16,9 @@ struct PlanDouble {
 
 PlanDouble& planDouble();
 
+/// How many plans of the FTP daemon were made so far, in all threads.
+int ftpPlans();
+
 } // namespace velt::test
 
 #endif

@@ -1,5 +1,6 @@
 // Supervisors that end without having been asked to.
 #include "standalone/standalone.h"
+#include "tests/standalone/control/plan_double.h"
 #include "tests/standalone/control/services_fixture.h"
 #include "tests/support/ports.h"
 #include "tests/support/waiting.h"
@@ -99,6 +100,18 @@ TEST_F(ServiceWatchTest, AFailedStartIsTriedAgain) {
         seconds(2)));
     other.reset();
     EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, seconds(4)));
+}
+
+TEST_F(ServiceWatchTest, AStartThatFailsIsNotTriedAgainAtEachLook) {
+    const DaemonState former = serviceState("ftpd");
+    kill(former.supervisor);
+    kill(former.daemon);
+    const Listener other(ftpPort_);
+    const int before = ftpPlans();
+    ASSERT_EQ(messageOf(watchServices()), "");
+    ASSERT_TRUE(waitUntil([before] { return ftpPlans() > before; }, seconds(2)));
+    std::this_thread::sleep_for(milliseconds(2600));
+    EXPECT_LE(ftpPlans() - before, 2) << "a second later, and then after two seconds";
 }
 
 TEST_F(ServiceWatchTest, WhatWasStoppedPausedOrRefusedIsLeftAlone) {

@@ -6,6 +6,7 @@
 #include "tests/support/ports.h"
 #include "tests/support/waiting.h"
 
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -232,6 +233,17 @@ TEST_F(ServicesTest, AliveIsTheProcessAndNotItsFile) {
     signalProcess(state.daemon, SIGKILL);
     ASSERT_TRUE(waitUntil([&] { return !isAlive(state.daemon); }, seconds(1)));
     EXPECT_EQ(VELTSFTPIsAlive(), 0);
+}
+
+TEST_F(ServicesTest, WhatASupervisorWritesIsChangedByItsUserAlone) {
+    const mode_t former = ::umask(0);
+    EXPECT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    ::umask(former);
+    for (const char* file : {"run/velt/sftp.state", "run/velt/sftp.lock", "run/velt/sftp.sock"}) {
+        struct stat status {};
+        ASSERT_EQ(::stat((root_ / file).c_str(), &status), 0) << file;
+        EXPECT_EQ(status.st_mode & (S_IWGRP | S_IWOTH), 0U) << file;
+    }
 }
 
 TEST_F(ServicesTest, AfterABootWhatIsEnabledStarts) {
