@@ -335,8 +335,10 @@ TEST_F(ShareGrants, refuseEveryLoginWhenTheirFileCannotBeTrusted) {
     writeFile(file, text.substr(0, text.size() / 2));
     expectRefused("damaged");
     writeFile(file, text);
-    fs::permissions(file, fs::perms(0666));
+    fs::permissions(file, fs::perms(0646));
     expectRefused("anybody could have written it");
+    fs::permissions(file, fs::perms(0664));
+    expectRefused("its group could have written it");
     fs::permissions(file, fs::perms(0644));
     EXPECT_EQ(seenBy("alice"), "data");
     fs::rename(file, file.string() + ".away");

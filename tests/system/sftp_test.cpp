@@ -16,6 +16,7 @@
 #include <unistd.h>
 
 #include <filesystem>
+#include <fstream>
 
 namespace velt::test {
 namespace {
@@ -38,9 +39,13 @@ protected:
     }
     void TearDown() override {
         daemon_.stop();
-        for (const fs::path& path : {fs::path(key_), fs::path(key_ + ".pub"), fs::path("/mnt/known"),
-                                     fs::path("/mnt/home/alice/.ssh"), fs::path("/mnt/home/alice/file"),
-                                     worldRoot / "etc", worldRoot / "run", worldRoot / "var"}) {
+        if (!accounts_.empty()) {
+            std::ofstream("/etc/passwd") << accounts_;
+        }
+        for (const fs::path& path :
+             {fs::path(key_), fs::path(key_ + ".pub"), fs::path("/mnt/known"),
+              fs::path("/mnt/home/alice/.ssh"), fs::path("/mnt/home/alice/file"), fs::path("/mnt/home/root"),
+              worldRoot / "etc", worldRoot / "run", worldRoot / "var"}) {
             std::error_code error;
             fs::remove_all(path, error);
         }
@@ -50,6 +55,14 @@ protected:
         fs::create_directories(home / ".ssh");
         writeFile(home / ".ssh" / "authorized_keys", contentsOf(key_ + ".pub"), id);
         ASSERT_EQ(chown((home / ".ssh").c_str(), id, id), 0);
+    }
+
+    /// Until the end of the test.
+    void changeAccount(const std::string& from, const std::string& to) {
+        accounts_ = contentsOf("/etc/passwd");
+        std::string changed = accounts_;
+        ASSERT_NE(changed.find(from), std::string::npos);
+        std::ofstream("/etc/passwd") << changed.replace(changed.find(from), from.size(), to);
     }
 
     void start(int atPort) {
@@ -89,6 +102,7 @@ protected:
     }
 
     const std::string key_ = "/mnt/key";
+    std::string accounts_; ///< before a change of the test's; "" for none
     DaemonProcess daemon_;
 };
 
@@ -103,6 +117,7 @@ TEST_F(SftpService, transfersFilesBothWays) {
 }
 
 TEST_F(SftpService, givesNoShellAndForwardsNothing) {
+    changeAccount("/mnt/home/alice:/usr/sbin/nologin", "/mnt/home/alice:/bin/sh");
     start(port);
     auto shell = client("ssh", port);
     shell.insert(shell.end(), {"alice@127.0.0.1", "id"});
@@ -152,8 +167,10 @@ TEST_F(SftpService, aCertificateThatIsRestrictedToACommandOpensNothing) {
 }
 
 TEST_F(SftpService, refusesRootAndStrangers) {
+    changeAccount("root:/root:", "root:/mnt/home/root:");
+    allow("/mnt/home/root", 0);
     start(port);
-    EXPECT_NE(sftp("pwd\n", "root").exitCode, 0);
+    EXPECT_NE(sftp("pwd\n", "root").exitCode, 0) << "whatever key root has";
     EXPECT_NE(sftp("pwd\n", "carol").exitCode, 0) << "she has no key here";
 }
 
