@@ -11,6 +11,7 @@ inline constexpr std::string_view ftpSettings = "/etc/velt/ftp.conf";
 inline constexpr std::string_view sftpSettings = "/etc/velt/sftp.conf";
 inline constexpr std::string_view networkSettings = "/etc/velt/network.conf";
 inline constexpr std::string_view firewallSettings = "/etc/velt/firewall.conf";
+inline constexpr std::string_view banSettings = "/etc/velt/bans.conf";
 inline constexpr std::string_view logRetention = "/etc/velt/log.conf";
 inline constexpr std::string_view knownServices = "/etc/velt/known_services.conf";
 inline constexpr std::string_view shares = "/etc/velt/shares.json";
@@ -34,6 +35,7 @@ inline constexpr std::string_view events = "/var/log/velt/events.jsonl"; ///< an
 inline constexpr std::string_view run = "/run/velt"; ///< a folder; supervisors keep their files in it
 inline constexpr std::string_view ftpRun = "/run/velt/ftp";
 inline constexpr std::string_view sftpConfigurations = "/run/velt/sftp/configurations"; ///< a folder
+inline constexpr std::string_view bans = "/run/velt/bans";
 inline constexpr std::string_view loadedRules = "/run/velt/firewall.loaded";
 inline constexpr std::string_view firewallWarning = "/run/velt/firewall.warning";
 
