@@ -15,6 +15,9 @@ struct Pipe {
 /// A pipe whose ends no program inherits.
 Result<Pipe> makePipe();
 
+/// The same, but each read gives what one write gave, of up to PIPE_BUF bytes.
+Result<Pipe> makePacketPipe();
+
 } // namespace velt
 
 #endif

@@ -35,6 +35,7 @@ void addShareCommands(CLI::App& app, Command& chosen);
 void addChrootCommands(CLI::App& app, Command& chosen);
 void addStatusCommands(CLI::App& app, Command& chosen);
 void addLogCommand(CLI::App& app, Command& chosen);
+void addBanCommands(CLI::App& app, Command& chosen);
 void addTokenCommands(CLI::App& app, Command& chosen);
 void addDocumentCommands(CLI::App& app, Command& chosen);
 void addCallCommand(CLI::App& app, Command& chosen);

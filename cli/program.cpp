@@ -83,6 +83,7 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     addSettingsCommands(app, chosen);
     addShareCommands(app, chosen);
     addChrootCommands(app, chosen);
+    addBanCommands(app, chosen);
     addTokenCommands(app, chosen);
     addDocumentCommands(app, chosen);
     addCallCommand(app, chosen);

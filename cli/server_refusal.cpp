@@ -69,6 +69,9 @@ std::string failureHint(const Json::Value& problem, bool reads) {
 }
 
 std::string absenceHint(const std::string& path) {
+    if (path.starts_with("/api/bans/")) {
+        return "'veltctl bans list' lists the bans.";
+    }
     return path.starts_with("/api/tokens/") ? "'veltctl tokens list' lists the tokens."
                                             : "'veltctl call --list' lists the methods.";
 }

@@ -23,6 +23,9 @@
 #include "standalone/journal/request_actor.h"
 #include "standalone/journal/subscriptions.h"
 
+// Who is refused for a while after too many failed logins.
+#include "standalone/bans/login_guard.h"
+
 // The calling thread's last error in a sentence.
 #include "standalone/contract/last_error.h"
 

@@ -8,6 +8,8 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
+#include <cstdint>
 #include <utility>
 
 namespace velt::host {
@@ -43,6 +45,10 @@ AccessControl::AccessControl(AccessSettings settings, const TokenStore& tokens, 
 
 std::optional<Refusal> AccessControl::check(const HttpRequest& head, const Peer& peer,
                                             Principal& principal) const {
+    // Also with a valid token: whoever else has the address is not let on guessing.
+    if (const auto ban = peer.isUnixSocket ? std::nullopt : currentBanOf(peer.address)) {
+        return refuseBanned(*ban, peer);
+    }
     if (auto refusal = authenticate(head, peer, principal)) {
         return refusal;
     }
@@ -83,6 +89,9 @@ std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, cons
     const bool bearer = lowerCase(head.authorization.substr(0, schemeLength)) == "bearer ";
     const auto token = bearer ? tokens_.find(head.authorization.substr(schemeLength)) : std::nullopt;
     if (!token) {
+        if (!peer.isUnixSocket) {
+            noteFailedLogin("veltd", peer.address);
+        }
         return refuse(401, "The token is not valid.", peer, true);
     }
     principal.role = token->role;
@@ -107,6 +116,15 @@ bool AccessControl::knowsHost(const std::string& host, const Peer& peer) const {
     const auto isName = [&name = name](const std::string& each) { return lowerCase(each) == name; };
     return name == "localhost" || name == "127.0.0.1" || name == "::1" || name == peer.localAddress ||
            std::ranges::any_of(settings_.hostNames, isName);
+}
+
+Refusal AccessControl::refuseBanned(const Ban& ban, const Peer& peer) const {
+    const auto left = std::chrono::ceil<std::chrono::seconds>(ban.until - std::chrono::system_clock::now());
+    Refusal refusal =
+        refuse(429, "Too many logins from this address have failed. Try again later.", peer, false);
+    refusal.response.headers.emplace_back("Retry-After",
+                                          std::to_string(std::max<std::int64_t>(1, left.count())));
+    return refusal;
 }
 
 Refusal AccessControl::refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const {

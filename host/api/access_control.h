@@ -2,13 +2,14 @@
 //
 // The kernel names the peer of a Unix socket: root, the host's own user and the members of the
 // administrators' group are admins. Everybody else needs a bearer token. What a page of another origin makes
-// a browser send is refused in any case.
+// a browser send is refused in any case, and so is, over TCP, an address from which too many logins failed.
 #ifndef VELT_HOST_API_ACCESS_CONTROL_H
 #define VELT_HOST_API_ACCESS_CONTROL_H
 
 #include "host/api/token_store.h"
 #include "host/base/host_log.h"
 #include "host/http/message.h"
+#include "standalone/standalone.h"
 
 #include <optional>
 #include <string>
@@ -36,6 +37,7 @@ private:
                                         Principal& principal) const;
     bool isAdmin(const Peer& peer) const;
     bool knowsHost(const std::string& host, const Peer& peer) const;
+    Refusal refuseBanned(const Ban& ban, const Peer& peer) const;
     Refusal refuse(int status, const std::string& detail, const Peer& peer, bool delayed) const;
 
     AccessSettings settings_;

@@ -1,5 +1,6 @@
 #include "host/api/app.h"
 
+#include "host/api/bans.h"
 #include "host/api/log_page.h"
 #include "host/api/problem.h"
 #include "host/api/status.h"
@@ -67,6 +68,7 @@ void App::addRoutes(const ModuleTable& table) {
     };
     add(rows_.routes());
     add(statusRoutes(table));
+    add(banRoutes(log_));
     add(tokenRoutes(tokens_, log_));
     add({logRoute(), metricsRoute(metrics_, table, events_), openApiRoute(openApi_), eventRoute()});
 }

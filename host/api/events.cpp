@@ -17,6 +17,11 @@ void publish(EventHub& hub, const SystemEvent& event) {
     if (event.name == "velt.service.action") {
         hub.publish("service", jsonObject({{"service", valueOf(event, "SERVICE_NAME")},
                                            {"action", valueOf(event, "SERVICE_ACTION")}}));
+    } else if (event.name == "velt.login.ban") {
+        hub.publish("ban", jsonObject({{"action", valueOf(event, "ACTION")},
+                                       {"address", valueOf(event, "ADDRESS")},
+                                       {"service", valueOf(event, "SERVICE")},
+                                       {"until", valueOf(event, "UNTIL")}}));
     }
 }
 

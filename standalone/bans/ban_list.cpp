@@ -14,7 +14,7 @@ namespace {
 
 constexpr std::size_t mostBans = 4096;
 constexpr std::int64_t lastSecond = 253402300799; ///< of the year 9999; a clock can hold it
-constexpr mode_t mode = 0644;
+constexpr mode_t mode = 0600;
 
 std::optional<Ban> parseBan(std::string_view line) {
     const auto source = parseIpNetwork(cut(line, ' '));

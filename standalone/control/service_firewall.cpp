@@ -1,5 +1,6 @@
 #include "standalone/control/service_firewall.h"
 
+#include "standalone/bans/login_guard.h"
 #include "standalone/core/effects.h"
 #include "standalone/daemons/daemon.h"
 #include "standalone/firewall/firewall_table.h"
@@ -8,21 +9,26 @@
 
 namespace velt {
 
-Result<std::vector<VELT_FTP_PORT_RANGE>> enabledPorts() {
-    std::vector<VELT_FTP_PORT_RANGE> open;
+Result<FirewallNeeds> firewallNeeds() {
+    FirewallNeeds needs;
     for (const Daemon* daemon : allDaemons()) {
         VELT_ASSIGN_OR_RETURN(const auto settings, daemon->settings());
         if (settings.enabled()) {
             for (const DaemonPorts& ports : settings.ports) {
-                open.push_back(ports.range);
+                needs.openPorts.push_back(ports.range);
+                // The ports of sessions are of no use to who cannot begin one.
+                if (!ports.ofSessions) {
+                    needs.loginPorts.push_back(ports.range);
+                }
             }
         }
     }
-    return open;
+    needs.banned = sourcesToRefuse();
+    return needs;
 }
 
 Result<> openServicePorts() {
-    return perform(Effect::firewall, "firewall rules", [] { return loadFirewallRules(enabledPorts); });
+    return perform(Effect::firewall, "firewall rules", [] { return loadFirewallRules(firewallNeeds); });
 }
 
 void followWithFirewall() {

@@ -3,14 +3,12 @@
 #define VELT_STANDALONE_CONTROL_SERVICE_FIREWALL_H
 
 #include "base/result.h"
-#include "ftp/ftp_library.h"
-
-#include <vector>
+#include "standalone/firewall/firewall_table.h"
 
 namespace velt {
 
-/// The TCP ports that the enabled services need, by the stored settings.
-Result<std::vector<VELT_FTP_PORT_RANGE>> enabledPorts();
+/// The TCP ports of the enabled services, by the stored settings, and who is banned from them.
+Result<FirewallNeeds> firewallNeeds();
 
 /// Makes the firewall follow the stored settings. Safe from all threads and processes.
 Result<> openServicePorts();

@@ -19,11 +19,13 @@ namespace {
 // - set-group-id folders (RestrictSUIDSGID=, which refuses openat2 as well, as the view of a login needs it;
 //   over FTP our module keeps such bits from everybody);
 // - code that is made at run time, as some modules do (MemoryDenyWriteExecute=);
-// - the right to mount, for the views of sessions (CAP_SYS_ADMIN, @mount).
+// - the right to mount, for the views of sessions (CAP_SYS_ADMIN, @mount);
+// - the right to change the firewall, for the supervisor, which has it refuse who fails to log in too often
+//   (CAP_NET_ADMIN).
 constexpr std::string_view restrictions =
     "CapabilityBoundingSet=CAP_AUDIT_WRITE CAP_CHOWN CAP_DAC_OVERRIDE CAP_DAC_READ_SEARCH CAP_FOWNER "
-    "CAP_FSETID CAP_KILL CAP_NET_BIND_SERVICE CAP_SETGID CAP_SETUID CAP_SYS_ADMIN CAP_SYS_CHROOT "
-    "CAP_SYS_NICE CAP_SYS_PTRACE CAP_SYS_RESOURCE\n"
+    "CAP_FSETID CAP_KILL CAP_NET_ADMIN CAP_NET_BIND_SERVICE CAP_SETGID CAP_SETUID CAP_SYS_ADMIN "
+    "CAP_SYS_CHROOT CAP_SYS_NICE CAP_SYS_PTRACE CAP_SYS_RESOURCE\n"
     "NoNewPrivileges=yes\n"
     "SystemCallFilter=~@clock @cpu-emulation @debug @module @obsolete @raw-io @reboot @swap\n"
     "SystemCallErrorNumber=EPERM\n"

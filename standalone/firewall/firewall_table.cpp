@@ -1,17 +1,15 @@
 #include "standalone/firewall/firewall_table.h"
 
 #include "base/file.h"
-#include "base/text.h"
-#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/loaded_rules.h"
+#include "standalone/firewall/rule_script.h"
 #include "standalone/firewall/ruleset.h"
 #include "standalone/firewall/ruleset_generation.h"
-#include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 
 #include <syslog.h>
@@ -31,20 +29,6 @@ std::filesystem::path warningFile() {
 
 std::string firstLine(const std::string& text) {
     return text.substr(0, text.find('\n'));
-}
-
-Result<> load(const std::string& script) {
-    const auto result = runProcess({"nft", "-f", "-"}, script);
-    if (result && result->exitCode == 0) {
-        return {};
-    }
-    const std::string errors = result ? result->errors : result.error().message;
-    std::string reason(trimmedEnd(firstLine(errors), ". ")); // it may be a sentence of its own
-    reason = reasonOfEnd(reason, result ? result->exitCode : 0);
-    if (reason.find("Operation not permitted") != std::string::npos) {
-        reason = "this process is not allowed to change the firewall";
-    }
-    return Error(ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + ".");
 }
 
 void warnOfForeignTables() {
@@ -67,28 +51,23 @@ void warnOfForeignTables() {
     }
 }
 
-/// The rules belong to the machine, so an installation below another root leaves them alone unless it was
-/// told about a firewall: its defaults would take away what the machine's own installation drops.
-bool mayTouchRules() {
-    return statePath("/") == "/" || fileExists(statePath(paths::firewallSettings));
-}
-
 Result<> removeRules(const std::string& script) {
-    VELT_RETURN_IF_ERROR(load(script));
+    VELT_RETURN_IF_ERROR(runRuleScript(script));
     noteRemoved();
     ::unlink(warningFile().c_str());
     return {};
 }
 
 // Each start of a service comes here, and most change no port.
-Result<> replaceRules(const std::string& script) {
+Result<> replaceRules(const std::string& script, const std::vector<BannedSource>& banned) {
     if (rulesAreInForce(script)) {
         return {};
     }
     // Noted before it is done, since a note without rules does no harm.
     VELT_RETURN_IF_ERROR(noteLoading());
     const auto before = rulesetGeneration();
-    VELT_RETURN_IF_ERROR(load(script));
+    // Those who are banned are no part of what is compared: they come and go with the rules in force.
+    VELT_RETURN_IF_ERROR(runRuleScript(script + renderBannedSources(banned)));
     noteLoaded(script, before);
     warnOfForeignTables();
     return {};
@@ -96,7 +75,7 @@ Result<> replaceRules(const std::string& script) {
 
 } // namespace
 
-Result<> loadFirewallRules(const std::function<Result<std::vector<VELT_FTP_PORT_RANGE>>()>& openPorts) {
+Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds) {
     if (!mayTouchRules()) {
         return {};
     }
@@ -108,9 +87,9 @@ Result<> loadFirewallRules(const std::function<Result<std::vector<VELT_FTP_PORT_
     if (off && !rulesWereLoaded()) {
         return {}; // nothing to take away, and perhaps no right to do it
     }
-    VELT_ASSIGN_OR_RETURN(const auto ports, openPorts());
-    const std::string script = renderRuleset(firewall, ports);
-    return off ? removeRules(script) : replaceRules(script);
+    VELT_ASSIGN_OR_RETURN(const auto needs, askNeeds());
+    const std::string script = renderRuleset(firewall, needs.openPorts, needs.loginPorts);
+    return off ? removeRules(script) : replaceRules(script, needs.banned);
 }
 
 } // namespace velt

@@ -4,15 +4,23 @@
 
 #include "base/result.h"
 #include "ftp/ftp_library.h"
+#include "standalone/firewall/banned_sources.h"
 
 #include <functional>
 #include <vector>
 
 namespace velt {
 
-/// Makes the rules in force those that open these ports; does nothing when they are already. The ports are
-/// asked for under the StateLock, and only when rules are to be made. Safe from all threads and processes.
-Result<> loadFirewallRules(const std::function<Result<std::vector<VELT_FTP_PORT_RANGE>>()>& openPorts);
+/// What the rules are to do.
+struct FirewallNeeds {
+    std::vector<VELT_FTP_PORT_RANGE> openPorts;  ///< for everybody
+    std::vector<VELT_FTP_PORT_RANGE> loginPorts; ///< closed to those who are banned
+    std::vector<BannedSource> banned;
+};
+
+/// Makes the rules in force those that are needed; does nothing when they are already. They are asked for
+/// under the StateLock, and only when rules are to be made. Safe from all threads and processes.
+Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds);
 
 } // namespace velt
 

@@ -1,6 +1,7 @@
 #include "standalone/firewall/loaded_rules.h"
 
 #include "base/file.h"
+#include "base/text.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/ruleset_generation.h"
@@ -53,6 +54,16 @@ void noteLoaded(std::string_view script, std::optional<std::uint32_t> before) {
     }
     if (const auto noted = replaceFile(noteFile(), note(*now, script), 0644); !noted) {
         ::syslog(LOG_WARNING, "%s", noted.error().message.c_str());
+    }
+}
+
+void noteChanged(std::optional<std::uint32_t> before) {
+    const auto text = readFile(noteFile());
+    std::string_view script = text ? std::string_view(*text) : std::string_view();
+    cut(script, '\n');
+    cut(script, '\n');
+    if (before && text && *text == note(*before, script)) {
+        noteLoaded(script, before);
     }
 }
 

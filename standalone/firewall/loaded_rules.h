@@ -26,6 +26,10 @@ Result<> noteLoading();
 /// made a change in between, the rules count as loaded, but not as in force.
 void noteLoaded(std::string_view script, std::optional<std::uint32_t> before);
 
+/// Notes that we have changed elements of the rules in force. `before` is the generation before that. When
+/// the rules were not in force then, or somebody else made a change in between, they are not in force now.
+void noteChanged(std::optional<std::uint32_t> before);
+
 /// Notes that no rules of ours are loaded.
 void noteRemoved();
 

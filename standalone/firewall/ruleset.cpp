@@ -5,8 +5,9 @@
 namespace velt {
 namespace {
 
-std::string renderOpenPorts(const std::vector<VELT_FTP_PORT_RANGE>& ranges) {
-    std::string text = "    set tcp_open {\n"
+std::string renderPorts(const char* name, const std::vector<VELT_FTP_PORT_RANGE>& ranges) {
+    std::string text = std::string("    set ") + name +
+                       " {\n"
                        "        type inet_service\n"
                        "        flags interval\n"
                        "        auto-merge\n";
@@ -22,9 +23,29 @@ std::string renderOpenPorts(const std::vector<VELT_FTP_PORT_RANGE>& ranges) {
     return text + "    }\n";
 }
 
+// A network of 64 bits stands in its set as its first address.
+constexpr const char* bannedSets = "    set banned4 {\n"
+                                   "        type ipv4_addr\n"
+                                   "        flags timeout\n"
+                                   "    }\n"
+                                   "    set banned6 {\n"
+                                   "        type ipv6_addr\n"
+                                   "        flags timeout\n"
+                                   "    }\n";
+
+// Only the first packet of a connection: sessions that are open go on, and so do their transfers.
+constexpr const char* newLogins =
+    "        tcp dport @tcp_login tcp flags & (fin | syn | rst | ack) == syn jump logins\n";
+constexpr const char* loginsChain = "    chain logins {\n"
+                                    "        ip saddr @banned4 drop\n"
+                                    "        ip6 saddr @banned6 drop\n"
+                                    "        ip6 saddr & ffff:ffff:ffff:ffff:: @banned6 drop\n"
+                                    "    }\n";
+
 } // namespace
 
-std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& ports) {
+std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& openPorts,
+                          const std::vector<VELT_FTP_PORT_RANGE>& loginPorts) {
     // Adding a table that exists succeeds, deleting one that does not fails.
     std::string text = "add table inet velt_fileserv\n"
                        "delete table inet velt_fileserv\n";
@@ -32,18 +53,20 @@ std::string renderRuleset(const FirewallSettings& settings, const std::vector<VE
         return text;
     }
     const bool drop = settings.mode == FirewallMode::drop;
-    std::vector<VELT_FTP_PORT_RANGE> open = ports;
+    std::vector<VELT_FTP_PORT_RANGE> open = openPorts;
     if (drop) {
         open.insert(open.end(), settings.furtherPorts.begin(), settings.furtherPorts.end());
     }
-    text += "table inet velt_fileserv {\n" + renderOpenPorts(open) +
+    text += "table inet velt_fileserv {\n" + renderPorts("tcp_open", open) +
+            renderPorts("tcp_login", loginPorts) + bannedSets + loginsChain +
             "    chain input {\n"
             "        type filter hook input priority filter - 1; policy ";
-    text += drop ? "drop;\n"
-                   "        ct state vmap { established : accept, related : accept, invalid : drop }\n"
+    text += drop ? "drop;\n" : "accept;\n";
+    text += newLogins;
+    text += drop ? "        ct state vmap { established : accept, related : accept, invalid : drop }\n"
                    "        iif \"lo\" accept\n"
                    "        meta l4proto { icmp, ipv6-icmp } accept\n"
-                 : "accept;\n";
+                 : "";
     text += "        tcp dport @tcp_open accept\n"
             "    }\n"
             "}\n";

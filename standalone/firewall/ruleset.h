@@ -10,8 +10,10 @@
 namespace velt {
 
 /// A script that replaces our table, or in mode off removes it, whether there is one before or not. nft
-/// carries it out as a whole or not at all. `ports` are those that the services need.
-std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& ports);
+/// carries it out as a whole or not at all. `openPorts` are those that the services need; from `loginPorts`,
+/// those on which they accept logins, the addresses in the sets banned4 and banned6 are kept away.
+std::string renderRuleset(const FirewallSettings& settings, const std::vector<VELT_FTP_PORT_RANGE>& openPorts,
+                          const std::vector<VELT_FTP_PORT_RANGE>& loginPorts);
 
 } // namespace velt
 

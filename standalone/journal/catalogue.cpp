@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 20> entries{{
+constexpr std::array<CatalogueEntry, 22> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -31,6 +31,9 @@ constexpr std::array<CatalogueEntry, 20> entries{{
     {0x11B00028, "The share that anonymous FTP users are confined to was set to \"%1\"."},
     {0x11B00035, "The SFTP port was changed from %1 to %2."},
     {0x11B00036, "The SFTP service was enabled."},
+    // This system's own, far from those of the modules.
+    {0x11BF0001, "Logins from %1 are refused for %2 seconds after %3 failed ones at %4."},
+    {0x11BF0002, "The ban of %1 was lifted."},
 }};
 
 std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4>& texts) {

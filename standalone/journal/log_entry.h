@@ -16,7 +16,7 @@ struct LogEntry {
     std::chrono::system_clock::time_point time; ///< in whole milliseconds
     int category = 0;
     int level = 0;
-    unsigned event = 0;               ///< 0x11B000nn
+    unsigned event = 0;               ///< 0x11B000nn, or 0x11BF00nn of this system itself
     std::array<std::string, 4> texts; ///< "" for those that the event does not use
     std::string sentence;             ///< the event's sentence with the texts filled in
     std::string actor;                ///< "" for the system itself

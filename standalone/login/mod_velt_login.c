@@ -128,13 +128,19 @@ static int make_view(const char* root, int anonymous) {
     return good;
 }
 
-/* A local user's password has been checked. */
+/* A local user's password has been checked, or the user is not known. */
 static void on_authenticated(const void* data, void* ignored) {
     /* The daemon reads the code again after all listeners. */
     int* code = (int*)data;
     (void)ignored;
 
-    if (code == NULL || *code < 0 || session.anon_config != NULL) {
+    if (code == NULL || session.anon_config != NULL) {
+        return;
+    }
+    if (*code < 0) {
+        /* The supervisor counts these lines. Nothing in them is of the client's choosing. */
+        pr_log_pri(PR_LOG_NOTICE, "mod_velt_login: password refused from %s",
+                   pr_netaddr_get_ipstr(session.c->remote_addr));
         return;
     }
     const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);

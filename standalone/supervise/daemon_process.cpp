@@ -14,6 +14,7 @@
 
 #include <algorithm>
 #include <array>
+#include <climits>
 #include <csignal>
 #include <cstring>
 #include <string_view>
@@ -27,8 +28,9 @@ constexpr std::size_t longestLine = 400;
 
 } // namespace
 
-DaemonProcess::DaemonProcess() {
-    if (auto pipe = makePipe()) {
+// A message may hold a line break of a client's choosing, so the lines alone do not tell where one begins.
+DaemonProcess::DaemonProcess(Listener listener) : listener_(std::move(listener)) {
+    if (auto pipe = makePacketPipe()) {
         output_ = std::move(*pipe);
         // Only the reading side: a daemon does not expect its standard error to refuse a line.
         ::fcntl(output_.readEnd.get(), F_SETFL, O_NONBLOCK);
@@ -103,13 +105,17 @@ std::string DaemonProcess::takeLastWords() {
 }
 
 void DaemonProcess::readOutput() {
-    std::array<char, 4096> buffer{};
+    std::array<char, PIPE_BUF> buffer{};
     for (;;) {
         const ssize_t length = ::read(output_.readEnd.get(), buffer.data(), buffer.size());
         if (length <= 0) {
             return;
         }
-        for (const char character : std::string_view(buffer.data(), static_cast<std::size_t>(length))) {
+        const std::string_view message(buffer.data(), static_cast<std::size_t>(length));
+        if (listener_) {
+            listener_(message);
+        }
+        for (const char character : message) {
             if (character == '\n') {
                 takeLine(std::exchange(partialLine_, {}));
             } else if (partialLine_.size() < longestLine) {

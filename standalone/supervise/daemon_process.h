@@ -10,7 +10,9 @@
 
 #include <chrono>
 #include <deque>
+#include <functional>
 #include <string>
+#include <string_view>
 
 namespace velt {
 
@@ -19,8 +21,11 @@ class DaemonProcess {
 public:
     using Clock = std::chrono::steady_clock;
 
+    /// Told of each message that the daemon or a session of it wrote at once, as it came.
+    using Listener = std::function<void(std::string_view message)>;
+
     /// Opens the pipe for what the daemon and its sessions write to their standard output and error.
-    DaemonProcess();
+    explicit DaemonProcess(Listener listener = {});
 
     /// Starts the daemon and waits until it listens. On failure the daemon is gone, and the error is its own
     /// last words where it has some. What it writes goes to syslog, but no more than 600 lines a minute,
@@ -44,6 +49,7 @@ private:
     void takeLine(std::string line);
     void log(const std::string& line);
 
+    Listener listener_;
     Pipe output_; ///< with its write end, so that the read end never sees an end of file
     ProcessId id_;
     std::string partialLine_;

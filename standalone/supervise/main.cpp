@@ -14,6 +14,7 @@
 #include "base/text.h"
 #include "schema/settings_table.h"
 #include "standalone/supervise/control_channel.h"
+#include "standalone/supervise/login_watch.h"
 #include "standalone/supervise/service_manager.h"
 #include "standalone/supervise/supervisor.h"
 
@@ -98,7 +99,7 @@ void detach() {
 
 int supervise(const std::string& folder, const std::string& daemon, const DaemonOrder& order,
               void (*report)(const Result<>&)) {
-    velt::Supervisor supervisor(folder, daemon);
+    velt::Supervisor supervisor(folder, daemon, velt::watchLogins(folder, daemon));
     const Result<> started = supervisor.begin(order);
     report(started);
     if (!started) {

@@ -54,8 +54,8 @@ std::string statusLine(const DaemonState& state) {
 
 } // namespace
 
-Supervisor::Supervisor(std::filesystem::path folder, std::string name)
-    : folder_(std::move(folder)), name_(std::move(name)) {}
+Supervisor::Supervisor(std::filesystem::path folder, std::string name, DaemonProcess::Listener listener)
+    : folder_(std::move(folder)), name_(std::move(name)), daemon_(std::move(listener)) {}
 
 Result<> Supervisor::begin(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;

@@ -22,7 +22,8 @@ namespace velt {
 /// file.
 class Supervisor {
 public:
-    Supervisor(std::filesystem::path folder, std::string name);
+    /// The listener hears what the daemon and its sessions write.
+    Supervisor(std::filesystem::path folder, std::string name, DaemonProcess::Listener listener);
 
     /// Becomes the daemon's only supervisor, ends what a former one left, and starts the daemon. On failure
     /// nothing runs.

@@ -41,6 +41,9 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
     }
     std::sort(words.begin(), words.end());
     EXPECT_EQ(words, (Words{"",
+                            "bans",
+                            "bans lift",
+                            "bans list",
                             "call",
                             "chroot",
                             "chroot rules",

@@ -24,7 +24,10 @@ struct FakeStandalone {
     bool startHelps = false;             ///< and run once they are started
     int starts = 0;                      ///< how often the host started what is switched on
     std::map<std::string, std::uint64_t> restarts;
-    std::string actor; ///< of the last request
+    std::vector<velt::Ban> bans;
+    bool bansFail = false;                 ///< with `sentence`
+    std::vector<std::string> failedLogins; ///< "SERVICE ADDRESS"
+    std::string actor;                     ///< of the last request
     std::string address;
 
     static FakeStandalone& instance();

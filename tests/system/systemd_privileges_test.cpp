@@ -163,8 +163,8 @@ TEST_F(UnderSystemd, theServicesHaveNoMoreRightsThanTheyNeed) {
         done({"sftp", "set", "enable=on", "portnum=2222"});
         const std::string expected =
             rights({CAP_AUDIT_WRITE, CAP_CHOWN, CAP_DAC_OVERRIDE, CAP_DAC_READ_SEARCH, CAP_FOWNER, CAP_FSETID,
-                    CAP_KILL, CAP_NET_BIND_SERVICE, CAP_SETGID, CAP_SETUID, CAP_SYS_ADMIN, CAP_SYS_CHROOT,
-                    CAP_SYS_NICE, CAP_SYS_PTRACE, CAP_SYS_RESOURCE});
+                    CAP_KILL, CAP_NET_ADMIN, CAP_NET_BIND_SERVICE, CAP_SETGID, CAP_SETUID, CAP_SYS_ADMIN,
+                    CAP_SYS_CHROOT, CAP_SYS_NICE, CAP_SYS_PTRACE, CAP_SYS_RESOURCE});
         for (const char* service : {"ftpd", "sftp"}) {
             const DaemonState state = serviceState(service);
             for (const ProcessId& process : {state.supervisor, state.daemon}) {

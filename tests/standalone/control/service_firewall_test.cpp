@@ -25,10 +25,16 @@ protected:
     static void storeSftp(bool enabled) { ASSERT_EQ(messageOf(storeSftpSettings({enabled, 2222})), ""); }
 
     /// "2121-2121 55536-55899 "
-    static std::string open() {
-        const auto ports = enabledPorts();
-        std::string text = messageOf(ports);
-        for (const VELT_FTP_PORT_RANGE& range : ports.valueOr({})) {
+    static std::string open() { return describe(&FirewallNeeds::openPorts); }
+    static std::string login() { return describe(&FirewallNeeds::loginPorts); }
+
+    static std::string describe(std::vector<VELT_FTP_PORT_RANGE> FirewallNeeds::*which) {
+        const auto needs = firewallNeeds();
+        if (!needs) {
+            return needs.error().message;
+        }
+        std::string text;
+        for (const VELT_FTP_PORT_RANGE& range : (*needs).*which) {
             text += std::to_string(range.first) + "-" + std::to_string(range.last) + " ";
         }
         return text;
@@ -48,6 +54,7 @@ TEST_F(EnabledPorts, AreThoseOfTheEnabledServices) {
     storeFtp(VELT_FTP_SERVICE_PLAIN, 40000, 40100);
     storeSftp(true);
     EXPECT_EQ(open(), "2121-2121 40000-40100 2222-2222 ");
+    EXPECT_EQ(login(), "2121-2121 2222-2222 ") << "who cannot log in has no use for the others";
     storeFtp(4);
     EXPECT_EQ(open(), "2222-2222 ");
 }

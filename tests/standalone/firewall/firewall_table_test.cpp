@@ -9,10 +9,8 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
-#include "standalone/firewall/ruleset_generation.h"
 #include "tests/standalone/control/plan_double.h"
-#include "tests/standalone/firewall/private_network.h"
-#include "tests/standalone/supervise/daemon_test.h"
+#include "tests/standalone/firewall/firewall_test.h"
 #include "tests/support/run_program.h"
 #include "tests/support/temporary_folder.h"
 
@@ -25,7 +23,6 @@
 
 #include <atomic>
 #include <chrono>
-#include <cstdio>
 #include <cstdlib>
 #include <optional>
 #include <thread>
@@ -33,46 +30,6 @@
 
 namespace velt::test {
 namespace {
-
-std::string listTable() {
-    return runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).output;
-}
-
-class FirewallTest : public DaemonTest {
-protected:
-    void SetUp() override {
-        DaemonTest::SetUp();
-        network_.emplace();
-        if (!network_->isThere() || runProcess({"nft", "list", "tables"}).exitCode != 0) {
-            GTEST_SKIP() << "no private network here";
-        }
-        storeFtp(2121, VELT_FTP_SERVICE_PLAIN);
-        setMode(""); // below this root no rule is touched without a file
-    }
-
-    void TearDown() override {
-        network_.reset(); // its other host is a process of ours
-        DaemonTest::TearDown();
-    }
-
-    static void storeFtp(int port, int flags, int passiveFirst = 0, int passiveLast = 0) {
-        _tag_VELT_FTP_CONF_ record{};
-        ASSERT_EQ(VELTFTPConfGet(&record), 0) << lastErrorSentence();
-        std::snprintf(record.portnum, sizeof record.portnum, "%d", port);
-        record.service_flags = flags;
-        record.passive_port_min = passiveFirst;
-        record.passive_port_max = passiveLast;
-        ASSERT_EQ(VELTFTPConfSet(record), 0) << lastErrorSentence();
-    }
-
-    static void setMode(const std::string& lines) {
-        ASSERT_TRUE(replaceFile(statePath("/etc/velt/firewall.conf"), "version = 1\n" + lines + "\n", 0644));
-    }
-
-    static std::string warning() { return readFile(statePath("/run/velt/firewall.warning")).valueOr(""); }
-
-    std::optional<PrivateNetwork> network_;
-};
 
 TEST_F(FirewallTest, AcceptIsTheDefaultAndClosesNothing) {
     const OpenPort control(2121);
@@ -235,11 +192,6 @@ TEST_F(FirewallTest, AListedEffectChangesNothing) {
     setEffectHook({});
     EXPECT_EQ(listed, "firewall firewall rules");
     EXPECT_EQ(listTable(), "");
-}
-
-/// Counts the changes of the rules, whoever makes them.
-std::uint32_t generation() {
-    return rulesetGeneration().value_or(0);
 }
 
 TEST_F(FirewallTest, RulesThatAreInForceAreNotLoadedAgain) {

@@ -117,12 +117,12 @@ bool PrivateNetwork::neighbourReaches(int port) const {
            ::read(answers_, &answer, 1) == 1 && answer == 'y';
 }
 
-OpenPort::OpenPort(int port) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+OpenPort::OpenPort(int port) : descriptor_(::socket(AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
     const int on = 1; // ended connections of a former listener do not count
     ::setsockopt(descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_port = htons(static_cast<in_port_t>(port));
+    sockaddr_in6 address{};
+    address.sin6_family = AF_INET6;
+    address.sin6_port = htons(static_cast<in_port_t>(port));
     EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
     EXPECT_EQ(::listen(descriptor_, 16), 0);
 }

@@ -30,7 +30,7 @@ private:
     int answers_ = -1;
 };
 
-/// Listens on all addresses of the private network.
+/// Listens on all addresses of the private network, of both families.
 class OpenPort {
 public:
     explicit OpenPort(int port);

@@ -1,5 +1,6 @@
 // The firewall's settings and rules as text.
 
+#include "standalone/firewall/banned_sources.h"
 #include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/ruleset.h"
 #include "tests/standalone/support/state_folder.h"
@@ -13,14 +14,15 @@ namespace {
 using Ranges = std::vector<VELT_FTP_PORT_RANGE>;
 
 TEST(FirewallRules, OfModeOffRemoveTheTable) {
-    EXPECT_EQ(renderRuleset({FirewallMode::off, {}}, Ranges{{21, 21}}), "add table inet velt_fileserv\n"
-                                                                        "delete table inet velt_fileserv\n");
+    EXPECT_EQ(renderRuleset({FirewallMode::off, {}}, Ranges{{21, 21}}, Ranges{{21, 21}}),
+              "add table inet velt_fileserv\n"
+              "delete table inet velt_fileserv\n");
 }
 
 TEST(FirewallRules, OfModeAcceptDropNothing) {
-    EXPECT_EQ(
-        renderRuleset({FirewallMode::accept, {{8080, 8080}}}, Ranges{{21, 21}, {55536, 55899}, {222, 222}}),
-        R"(add table inet velt_fileserv
+    EXPECT_EQ(renderRuleset({FirewallMode::accept, {{8080, 8080}}},
+                            Ranges{{21, 21}, {55536, 55899}, {222, 222}}, Ranges{{21, 21}, {222, 222}}),
+              R"(add table inet velt_fileserv
 delete table inet velt_fileserv
 table inet velt_fileserv {
     set tcp_open {
@@ -29,8 +31,28 @@ table inet velt_fileserv {
         auto-merge
         elements = { 21, 55536-55899, 222 }
     }
+    set tcp_login {
+        type inet_service
+        flags interval
+        auto-merge
+        elements = { 21, 222 }
+    }
+    set banned4 {
+        type ipv4_addr
+        flags timeout
+    }
+    set banned6 {
+        type ipv6_addr
+        flags timeout
+    }
+    chain logins {
+        ip saddr @banned4 drop
+        ip6 saddr @banned6 drop
+        ip6 saddr & ffff:ffff:ffff:ffff:: @banned6 drop
+    }
     chain input {
         type filter hook input priority filter - 1; policy accept;
+        tcp dport @tcp_login tcp flags & (fin | syn | rst | ack) == syn jump logins
         tcp dport @tcp_open accept
     }
 }
@@ -38,7 +60,7 @@ table inet velt_fileserv {
 }
 
 TEST(FirewallRules, OfModeDropOpenTheFurtherPortsToo) {
-    EXPECT_EQ(renderRuleset({FirewallMode::drop, {{22, 22}, {8000, 8010}}}, Ranges{{2121, 2121}}),
+    EXPECT_EQ(renderRuleset({FirewallMode::drop, {{22, 22}, {8000, 8010}}}, Ranges{{2121, 2121}}, {}),
               R"(add table inet velt_fileserv
 delete table inet velt_fileserv
 table inet velt_fileserv {
@@ -48,8 +70,27 @@ table inet velt_fileserv {
         auto-merge
         elements = { 2121, 22, 8000-8010 }
     }
+    set tcp_login {
+        type inet_service
+        flags interval
+        auto-merge
+    }
+    set banned4 {
+        type ipv4_addr
+        flags timeout
+    }
+    set banned6 {
+        type ipv6_addr
+        flags timeout
+    }
+    chain logins {
+        ip saddr @banned4 drop
+        ip6 saddr @banned6 drop
+        ip6 saddr & ffff:ffff:ffff:ffff:: @banned6 drop
+    }
     chain input {
         type filter hook input priority filter - 1; policy drop;
+        tcp dport @tcp_login tcp flags & (fin | syn | rst | ack) == syn jump logins
         ct state vmap { established : accept, related : accept, invalid : drop }
         iif "lo" accept
         meta l4proto { icmp, ipv6-icmp } accept
@@ -60,9 +101,17 @@ table inet velt_fileserv {
 }
 
 TEST(FirewallRules, WithoutAServiceHaveAnEmptySet) {
-    const std::string text = renderRuleset({}, {});
+    const std::string text = renderRuleset({}, {}, {});
     EXPECT_EQ(text.find("elements"), std::string::npos);
     EXPECT_NE(text.find("set tcp_open"), std::string::npos);
+}
+
+TEST(FirewallRules, HoldEachBanForItsTime) {
+    EXPECT_EQ(renderBannedSources({}), "");
+    EXPECT_EQ(renderBannedSources({{*parseIpNetwork("192.0.2.7"), std::chrono::seconds(600)},
+                                   {*parseIpNetwork("2001:db8:1:2::/64"), std::chrono::seconds(0)}}),
+              "add element inet velt_fileserv banned4 { 192.0.2.7 timeout 600s }\n"
+              "add element inet velt_fileserv banned6 { 2001:db8:1:2:: timeout 1s }\n");
 }
 
 std::string describe(const Ranges& ranges) {

@@ -15,10 +15,11 @@ TEST(Catalogue, KnowsEveryEventOnce) {
     std::set<std::uint32_t> events;
     for (const CatalogueEntry& entry : catalogue())
         events.insert(entry.event);
-    EXPECT_EQ(events, (std::set<std::uint32_t>{0x11B00002, 0x11B00006, 0x11B00008, 0x11B00009, 0x11B0000A,
-                                               0x11B00010, 0x11B00011, 0x11B00012, 0x11B00013, 0x11B00019,
-                                               0x11B00020, 0x11B00021, 0x11B00022, 0x11B00024, 0x11B00025,
-                                               0x11B00026, 0x11B00027, 0x11B00028, 0x11B00035, 0x11B00036}));
+    EXPECT_EQ(events,
+              (std::set<std::uint32_t>{0x11B00002, 0x11B00006, 0x11B00008, 0x11B00009, 0x11B0000A, 0x11B00010,
+                                       0x11B00011, 0x11B00012, 0x11B00013, 0x11B00019, 0x11B00020, 0x11B00021,
+                                       0x11B00022, 0x11B00024, 0x11B00025, 0x11B00026, 0x11B00027, 0x11B00028,
+                                       0x11B00035, 0x11B00036, 0x11BF0001, 0x11BF0002}));
     EXPECT_EQ(events.size(), catalogue().size());
 }
 
@@ -48,6 +49,8 @@ TEST(Catalogue, PutsTheTextsWhereTheyBelong) {
     EXPECT_EQ(sentenceOf(0x11B00026, {"started", "", "", ""}),
               "Confining anonymous FTP users to one share was started.");
     EXPECT_EQ(sentenceOf(0x11B00035, {"22", "222", "", ""}), "The SFTP port was changed from 22 to 222.");
+    EXPECT_EQ(sentenceOf(0x11BF0001, {"192.0.2.1", "600", "10", "SFTP"}),
+              "Logins from 192.0.2.1 are refused for 600 seconds after 10 failed ones at SFTP.");
     EXPECT_EQ(sentenceOf(0x11B00028, {}),
               "The share that anonymous FTP users are confined to was set to \"\".");
 }

@@ -1,8 +1,11 @@
 // A daemon that behaves as its arguments say: what the supervisor is tried on.
 //
-//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--end-if FILE] [--stubborn] [--any]
+//     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--end-if FILE] [--say WORDS]...
+//     [--stubborn] [--any]
 //
 // It ends by itself when there is a FILE, before or after it listens.
+//
+// It says the WORDS, each at once, before it listens.
 //
 // It listens on loopback, with --any on all addresses; each connection is served by a session in a process
 // and a terminal session of its own, which answers every byte with the same byte and ends with its
@@ -17,6 +20,7 @@
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
+#include <string>
 #include <string_view>
 #include <thread>
 #include <vector>
@@ -28,6 +32,7 @@ struct Options {
     int delay = 0;
     const char* endFile = nullptr;
     const char* words = nullptr;
+    std::vector<std::string> messages;
     bool stubborn = false;
     bool any = false;
 };
@@ -57,6 +62,8 @@ Options parse(int argc, char** argv) {
             options.endFile = value;
         } else if (name == "--refuse") {
             options.words = value;
+        } else if (name == "--say") {
+            options.messages.emplace_back(value);
         }
     }
     return options;
@@ -101,6 +108,11 @@ int main(int argc, char** argv) {
     if (options.words != nullptr) {
         std::fprintf(stderr, "%s\n", options.words);
         return 1;
+    }
+    for (const std::string& message : options.messages) {
+        if (::write(STDERR_FILENO, message.data(), message.size()) < 0) {
+            return 1;
+        }
     }
     if (options.stubborn) {
         ::signal(SIGTERM, SIG_IGN);

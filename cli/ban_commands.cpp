@@ -1,0 +1,58 @@
+#include "base/json_value.h"
+#include "base/printable.h"
+#include "cli/command.h"
+#include "cli/failure.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+#include <ostream>
+#include <string>
+
+namespace velt::cli {
+
+namespace {
+
+void listBans(Context& context) {
+    const Json::Value answer = context.api.get("/api/bans");
+    if (context.wroteJson(answer)) {
+        return;
+    }
+    Table table({"ADDRESS", "SERVICE", "FAILURES", "UNTIL"});
+    for (const Json::Value& ban : answer["bans"]) {
+        table.add({textAt(ban, "address"), textAt(ban, "service"), ban["failures"].asString(),
+                   textAt(ban, "until")});
+    }
+    table.write(context.console.out);
+    if (!answer["bans"].empty() && !answer["firewall"].asBool()) {
+        context.console.err << "The firewall is off, so FTP and SFTP do not refuse these addresses.\n";
+    }
+}
+
+void liftBan(Context& context, const std::string& address) {
+    context.api.remove("/api/bans/" + percentEncode(address));
+    if (!context.wroteJson(jsonObject({{"lifted", address}}))) {
+        context.console.out << printable(address) << " is no longer banned.\n";
+    }
+}
+
+} // namespace
+
+void addBanCommands(CLI::App& app, Command& chosen) {
+    auto address = std::make_shared<std::string>();
+    CLI::App* bans = app.add_subcommand("bans", "Show and lift the bans after too many failed logins");
+    bans->require_subcommand(1);
+
+    CLI::App* list = bans->add_subcommand("list", "List the addresses that are banned now");
+    onWords(list, chosen, listBans);
+
+    CLI::App* lift = bans->add_subcommand("lift", "Let an address log in again");
+    lift->add_option("address", *address, "The address that 'bans list' shows, or one of its network")
+        ->required()
+        ->type_name("");
+    onWords(lift, chosen, [address](Context& context) { liftBan(context, *address); });
+}
+
+} // namespace velt::cli

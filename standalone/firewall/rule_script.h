@@ -1,0 +1,20 @@
+// Carrying out a script for the program nft.
+#ifndef VELT_STANDALONE_FIREWALL_RULE_SCRIPT_H
+#define VELT_STANDALONE_FIREWALL_RULE_SCRIPT_H
+
+#include "base/result.h"
+
+#include <string>
+
+namespace velt {
+
+/// The rules belong to the machine, so an installation below another root leaves them alone unless it was
+/// told about a firewall: its defaults would take away what the machine's own installation drops.
+bool mayTouchRules();
+
+/// Carries the script out, as a whole or not at all.
+Result<> runRuleScript(const std::string& script);
+
+} // namespace velt
+
+#endif
