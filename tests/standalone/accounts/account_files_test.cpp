@@ -25,6 +25,7 @@ TEST(ParsePasswd, SkipsWhatIsNoUser) {
                                  "# a:x:1:1:::",
                                  "#a:x:1:1:::",
                                  "+::::::",
+                                 "+a:x:1:1:::",
                                  "-@old:x:1:1:::",
                                  "a:x:one:1:::",
                                  "a:x:-1:1:::",

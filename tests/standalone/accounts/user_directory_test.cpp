@@ -92,6 +92,8 @@ TEST_F(UserDirectoryTest, SeesAChangeOfTheFileAtOnceEvenOfTheSameSize) {
 TEST_F(UserDirectoryTest, SeesAChangeOfTheRange) {
     folder_.write("login.defs", "UID_MIN 1001\nUID_MAX 70000\n");
     EXPECT_EQ(namesOf(*allUsers()), (Names{"zoe", "late"}));
+    folder_.write("login.defs", "UID_MIN 1000\nUID_MAX 1001\n");
+    EXPECT_EQ(namesOf(*allUsers()), (Names{"zoe", "anna"})) << "both ends belong to it";
 }
 
 TEST_F(UserDirectoryTest, KeepsASnapshotThatIsInUseUnchanged) {

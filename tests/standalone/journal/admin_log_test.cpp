@@ -195,7 +195,11 @@ TEST_F(AdminLogTest, IsAnEffectWithTheSentenceForItsSubject) {
 
 TEST_F(AdminLogTest, ADamagedDatabaseIsAnErrorThatNamesIt) {
     folder_.write("/var/lib/velt/log.db", std::string(5000, 'x'));
+    int heard = 0;
+    const Subscription subscription = subscribeLog([&heard](const LogEntry&) { ++heard; });
     EXPECT_LT(VELTLogSet1(2, 1, 0x11B00036, "", "", "", ""), 0);
+    unsubscribe(subscription);
+    EXPECT_EQ(heard, 0) << "of what was not stored";
     EXPECT_EQ(VLIBCErrGet(), static_cast<int>(ErrorNumber::log));
     EXPECT_NE(lastErrorSentence().find("log.db"), std::string::npos) << lastErrorSentence();
     EXPECT_FALSE(queryLog({}));

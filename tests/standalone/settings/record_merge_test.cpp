@@ -44,6 +44,17 @@ TEST_F(RecordMerge, KeepsWhatAnotherChangedSinceTheRead) {
     EXPECT_STREQ(now.anonymous_chroot_share, "public");
 }
 
+TEST_F(RecordMerge, ASwitchOfOneServiceLeavesTheOthers) {
+    Record both = stored();
+    both.service_flags = VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS;
+    ASSERT_GE(VELTFTPConfSet(both), 0) << lastErrorSentence();
+    Record mine = stored();
+    meanwhile([](Record& record) { record.service_flags &= ~VELT_FTP_SERVICE_PLAIN; });
+    mine.service_flags &= ~VELT_FTP_SERVICE_TLS;
+    ASSERT_GE(VELTFTPConfSet(mine), 0) << lastErrorSentence();
+    EXPECT_EQ(stored().service_flags, 0);
+}
+
 TEST_F(RecordMerge, TheLaterOfTwoChangesOfOneFieldStays) {
     Record mine = stored();
     meanwhile([](Record& record) { record.max_conn_per_ip = 7; });
