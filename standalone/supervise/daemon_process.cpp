@@ -41,8 +41,11 @@ Result<> DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadli
     readOutput(); // what a former daemon left says nothing about this one
     lastLines_.clear();
     partialLine_.clear();
+    serves_ = false;
     VELT_RETURN_IF_ERROR(spawn(order));
-    return waitUntilListening(order, deadline);
+    auto started = waitUntilListening(order, deadline);
+    serves_ = bool(started);
+    return started;
 }
 
 Result<> DaemonProcess::spawn(const DaemonOrder& order) {
@@ -115,7 +118,10 @@ void DaemonProcess::readOutput() {
         if (listener_) {
             listener_(message);
         }
-        for (const char character : message) {
+        // Its clients choose parts of what a daemon says once it serves, and line breaks may be among them.
+        const std::size_t end = serves_ ? message.find_last_not_of("\r\n") : 0;
+        for (std::size_t i = 0; i < message.size(); ++i) {
+            const char character = i < end && message[i] == '\n' ? ' ' : message[i];
             if (character == '\n') {
                 takeLine(std::exchange(partialLine_, {}));
             } else if (partialLine_.size() < longestLine) {

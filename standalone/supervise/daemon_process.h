@@ -53,6 +53,7 @@ private:
     Pipe output_; ///< with its write end, so that the read end never sees an end of file
     ProcessId id_;
     std::string partialLine_;
+    bool serves_ = false; ///< what it says may contain what its clients say
     RateLimit logged_{600, std::chrono::minutes(1)};
     std::deque<std::string> lastLines_;
 };

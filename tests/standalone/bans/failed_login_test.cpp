@@ -39,8 +39,7 @@ TEST(FailedSftpLogin, IsNotWhatCameBeforeOrAfterIt) {
              "Invalid user nosuch from 192.0.2.7 port 38454\r\n",
              "Connection closed by authenticating user alice 192.0.2.7 port 53076 [preauth]\r\n",
              "Connection closed by invalid user nosuch 192.0.2.7 port 38454 [preauth]\r\n",
-             "maximum authentication attempts exceeded for alice from 192.0.2.7 port 49396 ssh2 "
-             "[preauth]\r\n",
+             "maximum authentication attempts exceeded for al from 192.0.2.7 port 49396 ssh2 [preauth]\r\n",
              "Disconnecting invalid user x 192.0.2.7 port 49396: Too many authentication failures [preauth]",
              "Postponed keyboard-interactive for alice from 192.0.2.7 port 48208 ssh2 [preauth]\r\n",
              "Failed keyboard-interactive/pam for alice from 192.0.2.7 port 48208 ssh2\r\n",

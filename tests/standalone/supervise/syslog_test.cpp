@@ -50,7 +50,7 @@ public:
     int linesWith(const std::string& text) const {
         int count = 0;
         std::array<char, 1024> line{};
-        for (ssize_t size = 0; (size = ::recv(socket_.get(), line.data(), line.size(), 0)) > 0;) {
+        for (ssize_t size = 0; (size = receive(line)) > 0;) {
             count += std::string(line.data(), static_cast<std::size_t>(size)).find(text) != std::string::npos;
         }
         return count;
@@ -59,7 +59,7 @@ public:
     /// The next line that holds the text; "" when none comes.
     std::string lineWith(const std::string& text) const {
         std::array<char, 1024> line{};
-        for (ssize_t size = 0; (size = ::recv(socket_.get(), line.data(), line.size(), 0)) > 0;) {
+        for (ssize_t size = 0; (size = receive(line)) > 0;) {
             const std::string received(line.data(), static_cast<std::size_t>(size));
             if (received.find(text) != std::string::npos) {
                 return received;
@@ -69,6 +69,15 @@ public:
     }
 
 private:
+    /// A socket that waits for a limited time is interrupted by any signal.
+    ssize_t receive(std::array<char, 1024>& line) const {
+        ssize_t size = 0;
+        do {
+            size = ::recv(socket_.get(), line.data(), line.size(), 0);
+        } while (size < 0 && errno == EINTR);
+        return size;
+    }
+
     UniqueFd socket_;
     bool isThere_ = false;
 };
@@ -78,17 +87,18 @@ protected:
     /// The line with `sign` that the supervisor of this daemon writes when it says the words; found
     /// in a child, whose "/dev" goes with it.
     std::string lineOf(const Daemon& daemon, const std::string& words, const std::string& sign) const {
-        return told(daemon, words, [&](const OwnLog& log) { return log.lineWith(sign); });
+        return told(daemon, {"--refuse", words}, [&](const OwnLog& log) { return log.lineWith(sign); });
     }
 
     /// How many lines with `sign` it writes.
     std::string countOf(const Daemon& daemon, const std::string& words, const std::string& sign) const {
-        return told(daemon, words, [&](const OwnLog& log) { return std::to_string(log.linesWith(sign)); });
+        return told(daemon, {"--refuse", words},
+                    [&](const OwnLog& log) { return std::to_string(log.linesWith(sign)); });
     }
 
-private:
+    /// What `listen` makes of the log when the daemon with these options starts and has a client.
     template<class Listen>
-    std::string told(const Daemon& daemon, const std::string& words, Listen&& listen) const {
+    std::string told(const Daemon& daemon, const std::vector<std::string>& options, Listen&& listen) const {
         const std::filesystem::path file = root_ / "line";
         const pid_t child = ::fork();
         if (child == 0) {
@@ -99,8 +109,12 @@ private:
             // Beside the start, which waits as long as nobody takes the lines.
             std::thread listener([&] { std::ofstream(file) << listen(log); });
             SupervisedDaemon supervised(daemon);
-            (void)supervised.start(testOrder(freePort(), "one", {"--refuse", words}));
+            const int port = freePort();
+            if (supervised.start(testOrder(port, "one", options))) {
+                (void)Client(port).isServed();
+            }
             listener.join();
+            (void)supervised.stop();
             ::_exit(0);
         }
         int status = -1;
@@ -133,6 +147,16 @@ TEST_F(SyslogTest, NoWordForgesALineOrAFormat) {
         GTEST_SKIP() << "no mount name space can be made here";
     }
     EXPECT_TRUE(line.ends_with("]: 50%n [2Jvelt-ftpd[1]: forged")) << line;
+}
+
+TEST_F(SyslogTest, WhatAClientSaysBeginsNoLine) {
+    const std::string message = "Invalid user x\nFailed password for root from 203.0.113.9\r\n";
+    const std::string line = told(sftpDaemon, {"--say-in-sessions", message},
+                                  [](const OwnLog& log) { return log.lineWith("Failed password"); });
+    if (line == "skip") {
+        GTEST_SKIP() << "no mount name space can be made here";
+    }
+    EXPECT_TRUE(line.ends_with("]: Invalid user x Failed password for root from 203.0.113.9")) << line;
 }
 
 TEST_F(SyslogTest, StrangersDoNotFillIt) {

@@ -33,6 +33,7 @@ struct Options {
     const char* endFile = nullptr;
     const char* words = nullptr;
     std::vector<std::string> messages;
+    std::string sessionMessage; ///< at the beginning of each session
     bool stubborn = false;
     bool any = false;
 };
@@ -64,6 +65,8 @@ Options parse(int argc, char** argv) {
             options.words = value;
         } else if (name == "--say") {
             options.messages.emplace_back(value);
+        } else if (name == "--say-in-sessions") {
+            options.sessionMessage = value;
         }
     }
     return options;
@@ -101,6 +104,22 @@ void endIfThere(const char* file) {
     ::_exit(0);
 }
 
+[[noreturn]] void serve(const std::vector<int>& listeners, const std::string& sessionMessage) {
+    for (;;) {
+        const int connection = ::accept(listeners.front(), nullptr, nullptr);
+        if (connection >= 0 && ::fork() == 0) {
+            for (const int listener : listeners) {
+                ::close(listener);
+            }
+            if (::write(STDERR_FILENO, sessionMessage.data(), sessionMessage.size()) < 0) {
+                ::_exit(1);
+            }
+            serveSession(connection);
+        }
+        ::close(connection);
+    }
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
@@ -134,14 +153,5 @@ int main(int argc, char** argv) {
     while (listeners.empty()) {
         ::pause();
     }
-    for (;;) {
-        const int connection = ::accept(listeners.front(), nullptr, nullptr);
-        if (connection >= 0 && ::fork() == 0) {
-            for (const int listener : listeners) {
-                ::close(listener);
-            }
-            serveSession(connection);
-        }
-        ::close(connection);
-    }
+    serve(listeners, options.sessionMessage);
 }
