@@ -93,6 +93,7 @@ TEST_F(LoginModule, keepsTheFilesOfTheHome) {
 
 TEST_F(LoginModule, doesNothingForAWrongPassword) {
     EXPECT_EQ(logIn(script("touch \"$1/ran\"\n"), true, true, -1), login_wrong);
+    EXPECT_STREQ(logged(), "mod_velt_login: password refused from 192.0.2.7");
     EXPECT_FALSE(std::filesystem::exists(folder_.path() / "ran"));
 }
 

@@ -136,6 +136,11 @@ void* pr_netaddr_get_inaddr(const pr_netaddr_t* address) {
     return NULL;
 }
 
+const char* pr_netaddr_get_ipstr(const pr_netaddr_t* address) {
+    (void)address;
+    return "192.0.2.7";
+}
+
 unsigned char check_context(cmd_rec* cmd, int contexts) {
     (void)cmd;
     (void)contexts;
@@ -198,6 +203,7 @@ void pr_session_end(int flags) {
 
 static void begin(const struct login_world* login) {
     static server_rec server;
+    static conn_t connection;
 
     main_server = &server;
     world = login;
@@ -205,6 +211,7 @@ static void begin(const struct login_world* login) {
     ended = FALSE;
     rights = 0;
     log_text[0] = '\0';
+    session.c = &connection;
     session.user = "alice";
     (void)velt_login_module.sess_init();
 }
