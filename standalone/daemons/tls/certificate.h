@@ -24,9 +24,9 @@ struct ServerCertificate {
 /// The administrator's certificate ("/etc/velt/tls/server.crt" and ".key" below the state root) if given,
 /// else a self-signed one, made at the first call and again once it has expired. Where the thread's hook
 /// leaves the store of it undone, a throw-away one that is gone with the result. Fails when a file cannot be
-/// read or written, key and certificate do not belong together, the kind of key is neither RSA nor an elliptic
-/// curve, or others than the owner (root or this process's user) and the group may read the given key, or
-/// others than the owner may write it. Thread-safe.
+/// read or written, key and certificate do not belong together, the kind of key is neither RSA nor an
+/// elliptic curve, or others than the owner (root or this process's user) and the group may read the given
+/// key, or others than the owner may write it. Thread-safe.
 Result<ServerCertificate> serverCertificate();
 
 } // namespace velt
