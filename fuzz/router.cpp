@@ -1,5 +1,6 @@
 // Requests of an administrator that get as far as the module, over the fake platform. The input is
 // "METHOD TARGET", a line end, and the body.
+#include "base/sha256.h"
 #include "fuzz/target.h"
 #include "host/api/app.h"
 #include "tests/host/fake_standalone.h"
@@ -22,6 +23,8 @@ struct Host {
     std::unique_ptr<velt::host::App> app;
 
     Host() {
+        // OpenSSL has to be there before, or it would end before the threads for which it keeps something.
+        static_cast<void>(velt::sha256(""));
         table.load(MODULE_PATH);
         velt::host::AppSettings settings;
         settings.tokenFile = folder.path() / "tokens.json";
