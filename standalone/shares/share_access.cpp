@@ -46,13 +46,10 @@ std::optional<Access> grantTo(const Identity& user, const ShareEntry& share) {
     return entry != share.users.end() ? entry->second : grantToGroups(share, user.gids);
 }
 
-Result<std::optional<Access>> accessOf(const Identity& user, const ShareEntry& share) {
-    return limited(grantTo(user, share), share, user);
-}
-
 Result<std::optional<Access>> accessOf(const std::string& account, const ShareEntry& share) {
     if (const std::optional<UserEntry> user = userByName(account)) {
-        return accessOf(Identity{account, user->uid, groupsOf(*user)}, share);
+        const Identity self{account, user->uid, groupsOf(*user)};
+        return limited(grantTo(self, share), share, self);
     }
     if (const std::optional<GroupEntry> group = groupByName(account)) {
         const Identity member{"", stranger, {group->gid}};

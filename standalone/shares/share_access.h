@@ -16,11 +16,9 @@ namespace velt {
 /// nothing about the user. Thread-safe.
 std::optional<Access> grantTo(const Identity& user, const ShareEntry& share);
 
-/// What the store grants this user or the file system allows, whichever is less. Thread-safe.
-Result<std::optional<Access>> accessOf(const Identity& user, const ShareEntry& share);
-
-/// The same for the user or, when there is no such user, the group of this name. For a group, the file system
-/// is asked about a member who owns nothing. Nothing also when there is no such account. Thread-safe.
+/// What the store grants the user or, when there is no such user, the group of this name, or what the file
+/// system allows, whichever is less. For a group, the file system is asked about a member who owns nothing.
+/// Nothing also when there is no such account. Thread-safe.
 Result<std::optional<Access>> accessOf(const std::string& account, const ShareEntry& share);
 
 } // namespace velt
