@@ -13,7 +13,7 @@ namespace velt {
 namespace {
 
 constexpr std::size_t mostBans = 4096;
-constexpr std::int64_t lastSecond = 253402300799; ///< of the year 9999; a clock can hold it
+constexpr std::int64_t lastSecond = 9'000'000'000; ///< in the year 2255; a clock counts nanoseconds
 constexpr mode_t mode = 0600;
 
 std::optional<Ban> parseBan(std::string_view line) {

@@ -90,7 +90,7 @@ TEST_F(BanList, OfVeryManyTheOneThatEndsFirstGivesWay) {
 TEST(BanFile, LeavesOutWhatIsNoBan) {
     EXPECT_EQ(describe(parseBans("192.0.2.1 1800000000 ftp 10\nnonsense\n\n192.0.2.2 x ftp 10\n"
                                  "192.0.2.3 1800000000 smtp 10\n192.0.2.4 1800000000 sftp 0\n"
-                                 "192.0.2.5 99999999999999 sftp 1\n192.0.2.6 -1 sftp 1\n"
+                                 "192.0.2.5 9999999999 sftp 1\n192.0.2.6 -1 sftp 1\n"
                                  "192.0.2.7 1800000000 veltd 10 x\n192.0.2.8 1800000000 veltd 10")),
               "192.0.2.1 192.0.2.8 ");
 }
