@@ -45,6 +45,10 @@ public:
     std::shared_ptr<const GroupSnapshot> groups();
     Modules modules();
 
+    /// Errors when the file could not be read when it was last looked at.
+    Result<> usersRead();
+    Result<> groupsRead();
+
 private:
     void refreshRemote();
     bool isCurrent(const std::optional<Clock::time_point>& readAt) const;
@@ -58,6 +62,8 @@ private:
     FileStamp passwdStamp_;
     FileStamp loginDefsStamp_;
     FileStamp groupStamp_;
+    Result<> usersRead_;
+    Result<> groupsRead_;
     Modules modules_; ///< of the domain and LDAP sources in use
     std::optional<Clock::time_point> modulesReadAt_;
     std::vector<UserEntry> remoteUsers_; ///< those that these sources told of
@@ -155,6 +161,7 @@ std::shared_ptr<const UserSnapshot> Directory::users() {
         return users_;
     }
     const auto text = readOptionalFile(sources_.passwd);
+    usersRead_ = text ? Result<>() : text.error();
     if (!text && users_ != nullptr) {
         return users_;
     }
@@ -172,11 +179,22 @@ std::shared_ptr<const GroupSnapshot> Directory::groups() {
         return groups_;
     }
     const auto text = readOptionalFile(sources_.group);
+    groupsRead_ = text ? Result<>() : text.error();
     if (text || groups_ == nullptr) {
         groups_ = std::make_shared<const GroupSnapshot>(parseGroup(textOf(text)));
         groupStamp_ = text ? stamp : FileStamp();
     }
     return groups_;
+}
+
+Result<> Directory::usersRead() {
+    const std::lock_guard lock(mutex_);
+    return usersRead_;
+}
+
+Result<> Directory::groupsRead() {
+    const std::lock_guard lock(mutex_);
+    return groupsRead_;
 }
 
 // Looking up one account must not wait for a listing: each FTP login is a new process, so the listing would
@@ -264,10 +282,15 @@ std::optional<GroupEntry> groupById(gid_t gid) {
     return askModules(&NameService::groupById, gid);
 }
 
+Result<> usersAreKnown() {
+    return directory().usersRead();
+}
+
 Result<UserEntry> findUser(const std::string& name) {
     if (auto user = userByName(name)) {
         return std::move(*user);
     }
+    VELT_RETURN_IF_ERROR(usersAreKnown());
     return Error(ErrorNumber::notFound, "There is no user \"" + plainText(name, longestNameShown) + "\".");
 }
 
@@ -275,6 +298,7 @@ Result<GroupEntry> findGroup(const std::string& name) {
     if (auto group = groupByName(name)) {
         return std::move(*group);
     }
+    VELT_RETURN_IF_ERROR(directory().groupsRead());
     return Error(ErrorNumber::notFound, "There is no group \"" + plainText(name, longestNameShown) + "\".");
 }
 

@@ -49,7 +49,11 @@ std::optional<UserEntry> userById(uid_t uid);
 std::optional<GroupEntry> groupByName(const std::string& name);
 std::optional<GroupEntry> groupById(gid_t gid);
 
-/// As userByName and groupByName; a missing account is an error.
+/// An error when the local users could not be read when they were last asked for: one that was not found may
+/// exist.
+Result<> usersAreKnown();
+
+/// As userByName and groupByName; a missing account is an error, and so is one that cannot be told.
 Result<UserEntry> findUser(const std::string& name);
 Result<GroupEntry> findGroup(const std::string& name);
 

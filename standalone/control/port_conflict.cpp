@@ -129,8 +129,9 @@ std::set<pid_t> ownProcesses(const Question& question) {
     return own;
 }
 
-std::optional<PortConflict> conflictWithListener(const Question& question, const std::vector<Claim>& claims) {
-    std::vector<ListeningSocket> sockets = listeningSockets();
+Result<std::optional<PortConflict>> conflictWithListener(const Question& question,
+                                                         const std::vector<Claim>& claims) {
+    VELT_ASSIGN_OR_RETURN(auto sockets, listeningSockets());
     // A stored passive range may have a port less, since each session takes one that is free. A daemon's own
     // port must be free, also when it is the stored one: the service may have been off.
     const auto canDoWithout = [&](int port) {
@@ -140,7 +141,7 @@ std::optional<PortConflict> conflictWithListener(const Question& question, const
         return !contains(question.range, socket.port) || canDoWithout(socket.port);
     });
     if (sockets.empty()) {
-        return std::nullopt;
+        return std::optional<PortConflict>();
     }
     const auto owners = ownersOf(sockets);
     const auto own = ownProcesses(question);
@@ -148,10 +149,10 @@ std::optional<PortConflict> conflictWithListener(const Question& question, const
         const auto owner = owners.find(socket.inode);
         const SocketOwner found = owner == owners.end() ? SocketOwner{} : owner->second;
         if (!own.contains(found.pid)) {
-            return heldBy(socket.port, describeOwner(found));
+            return std::optional(heldBy(socket.port, describeOwner(found)));
         }
     }
-    return std::nullopt;
+    return std::optional<PortConflict>();
 }
 
 } // namespace

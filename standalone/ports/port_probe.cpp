@@ -44,7 +44,7 @@ int tryPort(int port) {
 } // namespace
 
 std::string describeListener(int port) {
-    std::vector<ListeningSocket> sockets = listeningSockets();
+    std::vector<ListeningSocket> sockets = listeningSockets().valueOr({});
     std::erase_if(sockets, [port](const ListeningSocket& socket) { return socket.port != port; });
     const auto owners = ownersOf(sockets);
     return describeOwner(owners.empty() ? SocketOwner{} : owners.begin()->second);

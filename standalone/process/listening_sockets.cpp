@@ -1,5 +1,7 @@
 #include "standalone/process/listening_sockets.h"
 
+#include "base/file.h"
+#include "base/text.h"
 #include "standalone/process/process_identity.h"
 
 #include <unistd.h>
@@ -20,12 +22,13 @@ namespace {
 
 constexpr std::string_view listenState = "0A";
 
-void addSockets(const std::string& table, std::vector<ListeningSocket>& sockets) {
-    std::ifstream file(table);
-    std::string line;
-    std::getline(file, line); // the heading
-    while (std::getline(file, line)) {
-        std::istringstream fields(line);
+// A kernel without IPv6 has no table of it.
+Result<> addSockets(const std::string& table, std::vector<ListeningSocket>& sockets) {
+    VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(table));
+    std::string_view lines = text ? std::string_view(*text) : std::string_view();
+    cut(lines, '\n'); // the heading
+    while (!lines.empty()) {
+        std::istringstream fields{std::string(cut(lines, '\n'))};
         std::string slot;
         std::string local;
         std::string remote;
@@ -47,6 +50,7 @@ void addSockets(const std::string& table, std::vector<ListeningSocket>& sockets)
         std::from_chars(local.data() + colon + 1, local.data() + local.size(), socket.port, 16);
         sockets.push_back(socket);
     }
+    return {};
 }
 
 /// The inode of the socket behind an entry of /proc/PID/fd.
@@ -109,17 +113,17 @@ std::string programOf(pid_t pid) {
 
 } // namespace
 
-std::vector<ListeningSocket> listeningSockets(pid_t pid) {
+Result<std::vector<ListeningSocket>> listeningSockets(pid_t pid) {
     // "/proc/net" is the calling process's own; a thread could live in another namespace than its process.
     const std::string folder = pid == 0 ? "/proc/thread-self/net" : "/proc/" + std::to_string(pid) + "/net";
     std::vector<ListeningSocket> sockets;
-    addSockets(folder + "/tcp", sockets);
-    addSockets(folder + "/tcp6", sockets);
+    VELT_RETURN_IF_ERROR(addSockets(folder + "/tcp", sockets));
+    VELT_RETURN_IF_ERROR(addSockets(folder + "/tcp6", sockets));
     return sockets;
 }
 
 bool listensOn(pid_t pid, int port) {
-    std::vector<ListeningSocket> sockets = listeningSockets(pid);
+    std::vector<ListeningSocket> sockets = listeningSockets(pid).valueOr({});
     std::erase_if(sockets, [port](const ListeningSocket& socket) { return socket.port != port; });
     if (sockets.empty()) {
         return false;

@@ -2,6 +2,8 @@
 #ifndef VELT_STANDALONE_PROCESS_LISTENING_SOCKETS_H
 #define VELT_STANDALONE_PROCESS_LISTENING_SOCKETS_H
 
+#include "base/result.h"
+
 #include <sys/types.h>
 
 #include <map>
@@ -18,10 +20,10 @@ struct ListeningSocket {
 
 /// The listening TCP sockets, IPv4 and IPv6, of the network namespace in which the process `pid` lives; 0 is
 /// the caller.
-std::vector<ListeningSocket> listeningSockets(pid_t pid = 0);
+Result<std::vector<ListeningSocket>> listeningSockets(pid_t pid = 0);
 
 /// Whether the process itself holds a listening socket on the port. If its sockets cannot be seen:
-/// whether its user has such a socket.
+/// whether its user has such a socket. False when that cannot be told.
 bool listensOn(pid_t pid, int port);
 
 struct SocketOwner {

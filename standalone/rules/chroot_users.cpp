@@ -110,6 +110,7 @@ Result<> change(const std::vector<std::string>& names, void (*apply)(Rules&, con
 Result<std::vector<std::string>> chrootUsers(const UserFilter& filter) {
     VELT_ASSIGN_OR_RETURN(const auto ids, chrootUserIds());
     const auto users = allUsers();
+    VELT_RETURN_IF_ERROR(usersAreKnown());
     auto names = listedNames(*users, filter, ids, true);
     std::ranges::move(unlistedNames(ids, *users, filter), std::back_inserter(names));
     return names;
@@ -117,7 +118,9 @@ Result<std::vector<std::string>> chrootUsers(const UserFilter& filter) {
 
 Result<std::vector<std::string>> otherUsers(const UserFilter& filter) {
     VELT_ASSIGN_OR_RETURN(const auto ids, chrootUserIds());
-    return listedNames(*allUsers(), filter, ids, false);
+    const auto users = allUsers();
+    VELT_RETURN_IF_ERROR(usersAreKnown());
+    return listedNames(*users, filter, ids, false);
 }
 
 Result<> addChrootUsers(const std::vector<std::string>& names) {

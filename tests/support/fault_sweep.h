@@ -1,0 +1,50 @@
+// An operation that is done again and again, while one system call after another fails.
+#ifndef VELT_TESTS_SUPPORT_FAULT_SWEEP_H
+#define VELT_TESTS_SUPPORT_FAULT_SWEEP_H
+
+#include "tests/support/call_watch.h"
+
+#include <chrono>
+#include <functional>
+#include <string>
+
+namespace velt::test {
+
+/// One run of the operation, which has ended.
+struct SweptRun {
+    std::string fault; ///< "veltd: openat /etc/velt/ftp.conf: Too many open files", for messages
+    SeenCall call;     ///< the one that failed
+    ChildEnd end;
+};
+
+struct FaultSweep {
+    /// Before each run, in this process: brings what the run finds back to the same state.
+    std::function<void()> prepare;
+
+    /// The operation, in a child for each run.
+    std::function<std::string()> act;
+
+    /// Which calls are failed; all but those of isLoading when empty.
+    std::function<bool(const SeenCall&)> counts;
+
+    /// After each run in which a call has failed, in this process. What the child has started may still run;
+    /// nothing of it must be left at the end.
+    std::function<void(const SweptRun&)> check;
+
+    std::chrono::milliseconds limit{10'000}; ///< for one run; the test fails past it
+};
+
+/// Called within the operation: what follows is no part of it, and does not fail.
+void endFaults();
+
+/// Whether the call loads a program, its libraries, or what belongs to these.
+bool isLoading(const SeenCall& call);
+
+/// Does the operation once to learn its calls, and then once for each of them, which fails. Of calls that
+/// differ in numbers alone, the first and the last fail; with VELT_ALL_FAULTS in the environment, each does,
+/// and with several errors. Returns how many were tried.
+int sweepFaults(const FaultSweep& sweep);
+
+} // namespace velt::test
+
+#endif
