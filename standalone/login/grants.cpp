@@ -18,19 +18,29 @@ std::string keyOf(const std::filesystem::path& place) {
     return key;
 }
 
-/// The grant, or what the file system allows where that is less.
-std::optional<Access> toldOf(const Identity& user, const ShareEntry& share) {
-    const auto grant = grantTo(user, share);
-    return grant && *grant != Access::none ? std::min(*grant, accessTo(user, share.path)) : grant;
-}
-
 } // namespace
+
+/// The grant, or what the file system allows where that is less.
+std::optional<Access> Grants::toldOf(const Identity& user, const ShareEntry& share) {
+    const auto grant = grantTo(user, share);
+    if (!grant || *grant == Access::none) {
+        return grant;
+    }
+    const auto access = accessTo(user, share.path);
+    if (!access) {
+        remarks_.push_back("The share " + share.name + " grants nothing now: " + access.error().message);
+    }
+    return std::min(*grant, access.valueOr(Access::none));
+}
 
 Grants::Grants(const Identity& user, const std::vector<ShareEntry>& shares) {
     known_.reserve(shares.size());
     for (const ShareEntry& share : shares) {
         const Walk way = walk(share.path);
         const auto reached = placeOf(way.folder);
+        if (!reached || way.lost) {
+            looked_ = reached ? way.ended : reached.error();
+        }
         const bool found = reached && way.ended;
         const auto place = found ? *reached : reached.valueOr("/") / way.rest;
         known_.push_back({&share, place, found, toldOf(user, share), keyOf(place)});

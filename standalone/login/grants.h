@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_LOGIN_GRANTS_H
 #define VELT_STANDALONE_LOGIN_GRANTS_H
 
+#include "base/result.h"
 #include "standalone/login/view_mounts.h"
 #include "standalone/shares/share_entry.h"
 
@@ -20,8 +21,13 @@ public:
     /// The shares must outlive this. Asks once for each share: this is a login's view of them at one moment.
     Grants(const Identity& user, const std::vector<ShareEntry>& shares);
 
+    /// An error when a share may be anywhere, since its path could not be followed: nothing may be shown
+    /// then.
+    const Result<>& looked() const { return looked_; }
+
     /// What the store grants or the file system allows, whichever is less; none when the store says nothing
-    /// or the check fails. Shares around it for which the store says something can take from it.
+    /// or the check fails, of which a remark tells. Shares around it for which the store says something can
+    /// take from it.
     Access on(const ShareEntry& share) const;
 
     /// `access`, limited by the shares below the folder `outer` that contain the folder `place`.
@@ -38,6 +44,9 @@ public:
     /// no restrictions; so the shares around them grant at most reading.
     const std::vector<std::string>& missing() const { return missing_; }
 
+    /// A sentence for each share to which the user's access could not be checked.
+    const std::vector<std::string>& remarks() const { return remarks_; }
+
 private:
     struct Known {
         const ShareEntry* share;
@@ -53,10 +62,13 @@ private:
     Range strictlyBelow(const std::filesystem::path& place) const;
     /// Calls `visit` for those at the place and around it, outer ones first.
     template<class Visit> void around(const std::filesystem::path& place, const Visit& visit) const;
+    std::optional<Access> toldOf(const Identity& user, const ShareEntry& share);
     void limitAroundMissing();
 
     std::vector<Known> known_; ///< by key
+    Result<> looked_;
     std::vector<std::string> missing_;
+    std::vector<std::string> remarks_;
 };
 
 } // namespace velt

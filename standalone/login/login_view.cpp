@@ -51,6 +51,7 @@ class ViewMaker {
 public:
     ViewMaker(const Login& login, const std::filesystem::path& root, const std::vector<ShareEntry>& shares)
         : login_(login), root_(root), shares_(shares), grants_(login.user, shares) {
+        remarks = grants_.remarks();
         for (const std::string& share : grants_.missing()) {
             remarks.push_back("The folder of the share " + share +
                               " is missing; until it is back, nobody writes to the shares around it.");
@@ -62,6 +63,9 @@ public:
     Result<> showInShare(const std::string& path);
     Result<> showShares();
     Result<> showToAnonymous();
+
+    /// An error when nothing may be shown.
+    const Result<>& looked() const { return grants_.looked(); }
 
     std::vector<std::string> remarks;
 
@@ -177,6 +181,7 @@ Result<std::vector<std::string>> makeLoginView(const Login& login, const std::fi
     VELT_ASSIGN_OR_RETURN(const auto shares, readShares());
     VELT_RETURN_IF_ERROR(isolateMounts());
     ViewMaker maker(login, root, shares);
+    VELT_RETURN_IF_ERROR(maker.looked());
     VELT_RETURN_IF_ERROR(show(maker, login.view, rule));
     return std::move(maker.remarks);
 }

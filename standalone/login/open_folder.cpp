@@ -15,6 +15,7 @@
 #include <cerrno>
 #include <climits>
 #include <iterator>
+#include <optional>
 
 namespace velt {
 namespace {
@@ -65,10 +66,19 @@ Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& 
     return cannot("open", placeOf(folder).valueOr({}) / path, error);
 }
 
-bool onlyRootChanges(const UniqueFd& folder) {
-    struct stat status {};
-    return fstat(folder.get(), &status) == 0 && status.st_uid == 0 &&
-           (status.st_mode & (S_IWGRP | S_IWOTH)) == 0;
+bool onlyRootChanges(const struct stat& folder) {
+    return folder.st_uid == 0 && (folder.st_mode & (S_IWGRP | S_IWOTH)) == 0;
+}
+
+/// Whether what was looked for is not there, or leads nowhere. What root may not see, on another server's
+/// disk, is nothing here, and stays so; other failures say nothing of what is there.
+bool isAbsent(int error) {
+    return error == ENOENT || error == ENOTDIR || error == ELOOP || error == ENAMETOOLONG || error == EACCES;
+}
+
+/// Whether it is the file system's answer that the user may not.
+bool isRefusal(int error) {
+    return error == EACCES || error == EPERM || error == EROFS;
 }
 
 std::filesystem::path withoutFirst(const std::filesystem::path& path) {
@@ -79,16 +89,31 @@ std::filesystem::path withoutFirst(const std::filesystem::path& path) {
     return rest;
 }
 
+/// Nothing when that cannot be told.
+std::optional<bool> isLink(const UniqueFd& folder, const std::filesystem::path& name) {
+    struct stat status {};
+    if (fstatat(folder.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0) {
+        return S_ISLNK(status.st_mode);
+    }
+    return isAbsent(errno) ? std::optional(false) : std::nullopt;
+}
+
 /// Replaces the link that `name` is in the walk's folder, and that comes next, by what it says.
 Result<> followLink(Walk& walk, const std::filesystem::path& name) {
     const auto place = placeOf(walk.folder).valueOr({}) / name;
-    if (!onlyRootChanges(walk.folder)) {
+    struct stat folder {};
+    walk.lost = fstat(walk.folder.get(), &folder) < 0;
+    if (walk.lost) {
+        return cannot("open", place);
+    }
+    if (!onlyRootChanges(folder)) {
         return Error(ErrorNumber::invalid,
                      place.string() + " is a symbolic link that root need not have made.");
     }
     std::array<char, PATH_MAX> target{};
     const ssize_t size = readlinkat(walk.folder.get(), name.c_str(), target.data(), target.size());
     if (size <= 0 || size == static_cast<ssize_t>(target.size())) {
+        walk.lost = true;
         return cannot("open", place);
     }
     const std::filesystem::path path(std::string(target.data(), static_cast<std::size_t>(size)));
@@ -130,10 +155,10 @@ Walk walk(const std::filesystem::path& path) {
             continue;
         }
         const int error = errno;
-        struct stat status {};
-        const bool isLink = fstatat(walk.folder.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 &&
-                            S_ISLNK(status.st_mode);
-        walk.ended = isLink && links-- > 0 ? followLink(walk, name) : cannot("open", path, error);
+        const std::optional<bool> link = isLink(walk.folder, name);
+        walk.lost = !link || !isAbsent(error);
+        walk.ended =
+            link.value_or(false) && links-- > 0 ? followLink(walk, name) : cannot("open", path, error);
     }
     return walk;
 }
@@ -150,21 +175,30 @@ Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::p
     return opened;
 }
 
-Access accessTo(const Identity& user, const std::filesystem::path& path) {
+Result<Access> accessTo(const Identity& user, const std::filesystem::path& path) {
     if (user.gids.empty()) {
         return Access::none;
     }
     const FileRightsOf rights(user);
-    const UniqueFd folder(rights.taken() ? open(path.c_str(), asFolder) : -1);
+    if (!rights.taken()) {
+        return cannot("open", path, EPERM);
+    }
+    const UniqueFd folder(open(path.c_str(), asFolder));
+    if (!folder) {
+        return isAbsent(errno) || isRefusal(errno) ? Result<Access>(Access::none) : cannot("open", path);
+    }
     // The system call itself: where it is missing, the C library would answer for the process's numbers,
     // root's.
     const auto may = [&](int mode) {
+        errno = 0;
         return syscall(SYS_faccessat2, folder.get(), "", mode, AT_EACCESS | AT_EMPTY_PATH) == 0;
     };
-    if (!folder || !may(R_OK | X_OK)) {
-        return Access::none;
+    const bool readable = may(R_OK | X_OK);
+    const bool writable = readable && may(W_OK);
+    if (!writable && !isRefusal(errno)) {
+        return cannot("look at", path);
     }
-    return may(W_OK) ? Access::write : Access::read;
+    return writable ? Access::write : readable ? Access::read : Access::none;
 }
 
 Result<OpenedFolder> openFolderBelow(const Identity& user, const UniqueFd& folder,

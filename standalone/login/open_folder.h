@@ -25,6 +25,7 @@ struct Walk {
     UniqueFd folder;            ///< the last one on the way
     std::filesystem::path rest; ///< what is left of the path, links replaced; "" when the walk got to its end
     Result<> ended;             ///< why it did not
+    bool lost = false;          ///< where it ended could not be looked at: it may lead anywhere
 };
 
 /// Follows only symbolic links in folders that root owns and nobody else may change: anybody who may write to
@@ -35,8 +36,9 @@ Walk walk(const std::filesystem::path& path);
 Result<OpenedFolder> openFolderAs(const Identity& user, const std::filesystem::path& path);
 
 /// What the file system lets the user do with the folder: read when it can be reached, listed and entered,
-/// write when files can be made in it, too. Follows links as the user would. none when it cannot be asked.
-Access accessTo(const Identity& user, const std::filesystem::path& path);
+/// write when files can be made in it, too. Follows links as the user would. An error when it cannot be
+/// asked.
+Result<Access> accessTo(const Identity& user, const std::filesystem::path& path);
 
 /// With the user's rights, and never outside `folder`, even while folders and links are being moved. `path`
 /// is relative and not empty.
