@@ -57,7 +57,7 @@ SupervisedDaemon::SupervisedDaemon(const Daemon& daemon, std::unique_ptr<Supervi
 
 Result<> SupervisedDaemon::start(const DaemonOrder& order) {
     VELT_ASSIGN_OR_RETURN(const auto folder, runFolder());
-    const DaemonState now = daemonState(daemon_);
+    VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("does not start"));
     const bool supervised = isAlive(now.supervisor);
     if (supervised && isServing(now) && now.configurationHash == order.configurationHash) {
         return {};
@@ -93,8 +93,15 @@ Error SupervisedDaemon::failure(const std::string& what, std::string_view reason
     return {ErrorNumber::daemon, titleOf(daemon_) + " " + what + ": " + phrase + ".", where};
 }
 
+/// Who takes a daemon that runs for one that does not leaves it behind.
+Result<DaemonState> SupervisedDaemon::knownState(const std::string& what) const {
+    const auto state = readDaemonState(stateFile(statePath(paths::run), name_));
+    return state ? Result<DaemonState>(state->value_or(DaemonState{})) : failure(what, state.error().message);
+}
+
 Result<> SupervisedDaemon::pause() {
-    if (!isAlive(daemonState(daemon_).supervisor)) {
+    VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("cannot be paused"));
+    if (!isAlive(now.supervisor)) {
         // Without a supervisor nobody could end the sessions later, once their listener is gone and no longer
         // shows which are its own.
         return stop();
@@ -105,7 +112,7 @@ Result<> SupervisedDaemon::pause() {
 }
 
 Result<> SupervisedDaemon::stop() {
-    const DaemonState now = daemonState(daemon_);
+    VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("cannot be stopped"));
     std::optional<Result<>> answer;
     if (isAlive(now.supervisor)) {
         answer = askSupervisor(statePath(paths::run), name_, {Command::stop, {}}, endLimit);

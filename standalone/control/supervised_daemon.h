@@ -37,6 +37,7 @@ public:
 private:
     Result<> handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
                       const DaemonOrder& order);
+    Result<DaemonState> knownState(const std::string& what) const;
     Error failure(const std::string& what, std::string_view reason,
                   SourcePlace where = SourcePlace::current()) const;
 

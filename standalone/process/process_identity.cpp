@@ -3,10 +3,13 @@
 #include "base/number_text.h"
 #include "base/unique_fd.h"
 
+#include <fcntl.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
+#include <cerrno>
 #include <csignal>
 #include <filesystem>
 #include <fstream>
@@ -23,12 +26,12 @@ struct ProcessStat {
     unsigned long long startTime = 0;
 };
 
-std::optional<ProcessStat> readStat(pid_t pid) {
-    std::ifstream file("/proc/" + std::to_string(pid) + "/stat");
-    std::string line;
-    if (!std::getline(file, line)) {
-        return std::nullopt;
-    }
+struct StatReading {
+    std::optional<ProcessStat> stat; ///< nothing when there is no such process, or when that cannot be told
+    bool told = true;
+};
+
+std::optional<ProcessStat> parseStat(const std::string& line) {
     // The program's name is in parentheses and may itself contain blanks and parentheses.
     const auto nameEnd = line.rfind(')');
     if (nameEnd == std::string::npos) {
@@ -49,6 +52,16 @@ std::optional<ProcessStat> readStat(pid_t pid) {
     return stat;
 }
 
+StatReading readStat(pid_t pid) {
+    const UniqueFd file(::open(("/proc/" + std::to_string(pid) + "/stat").c_str(), O_RDONLY | O_CLOEXEC));
+    std::array<char, 1024> line{};
+    const ssize_t length = file ? ::read(file.get(), line.data(), line.size()) : -1;
+    if (length < 0) {
+        return {std::nullopt, errno == ENOENT || errno == ESRCH};
+    }
+    return {parseStat(std::string(line.data(), static_cast<std::size_t>(length)))};
+}
+
 bool hasEnded(const ProcessStat& stat) {
     return stat.state == 'Z' || stat.state == 'X';
 }
@@ -61,7 +74,7 @@ struct Relation {
 std::vector<Relation> allProcesses() {
     std::vector<Relation> all;
     for (const pid_t pid : allPids()) {
-        if (const auto stat = readStat(pid); stat && !hasEnded(*stat)) {
+        if (const auto stat = readStat(pid).stat; stat && !hasEnded(*stat)) {
             all.push_back({{pid, stat->startTime}, stat->parent});
         }
     }
@@ -107,7 +120,7 @@ std::string bootId() {
 }
 
 std::optional<ProcessId> identifyProcess(pid_t pid) {
-    const auto stat = readStat(pid);
+    const auto stat = readStat(pid).stat;
     if (!stat || hasEnded(*stat)) {
         return std::nullopt;
     }
@@ -115,7 +128,13 @@ std::optional<ProcessId> identifyProcess(pid_t pid) {
 }
 
 bool isAlive(const ProcessId& process) {
-    return process && identifyProcess(process.pid) == process;
+    if (!process) {
+        return false;
+    }
+    const StatReading reading = readStat(process.pid);
+    const bool isSame =
+        reading.stat && !hasEnded(*reading.stat) && reading.stat->startTime == process.startTime;
+    return isSame || !reading.told;
 }
 
 void signalProcess(const ProcessId& process, int signal) {
@@ -125,7 +144,7 @@ void signalProcess(const ProcessId& process, int signal) {
     // The descriptor always means the same process. What is compared after it was opened is therefore what
     // the signal reaches, even when the pid changes hands meanwhile.
     const UniqueFd descriptor(static_cast<int>(::syscall(SYS_pidfd_open, process.pid, 0)));
-    if (descriptor && isAlive(process)) {
+    if (descriptor && identifyProcess(process.pid) == process) {
         ::syscall(SYS_pidfd_send_signal, descriptor.get(), signal, nullptr, 0);
     }
 }

@@ -31,7 +31,7 @@ std::vector<pid_t> allPids();
 /// The process that has this pid now; nothing when there is none or it has ended and only waits to be reaped.
 std::optional<ProcessId> identifyProcess(pid_t pid);
 
-/// Whether this very process still runs.
+/// Whether this very process still runs, or may: who takes it for gone would leave it behind.
 bool isAlive(const ProcessId& process);
 
 /// Sends the signal to this very process; nothing happens when it has ended.

@@ -59,6 +59,15 @@ Result<> DaemonProcess::spawn(const DaemonOrder& order) {
     VELT_ASSIGN_OR_RETURN(const auto pid, program.start(order.arguments));
     // A child that has ended already cannot be identified any more, but keeps its pid until it is reaped.
     id_ = identifyProcess(pid).value_or(ProcessId{pid, 0});
+    siginfo_t ended{};
+    if (id_.startTime == 0 &&
+        ::waitid(P_PID, static_cast<id_t>(pid), &ended, WEXITED | WNOHANG | WNOWAIT) == 0 &&
+        ended.si_pid == 0) {
+        ::kill(pid, SIGKILL); // what cannot be told from other processes could not be ended later
+        ::waitpid(pid, nullptr, 0);
+        id_ = {};
+        return Error("its process cannot be watched");
+    }
     return {};
 }
 

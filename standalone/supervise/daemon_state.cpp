@@ -1,5 +1,6 @@
 #include "standalone/supervise/daemon_state.h"
 
+#include "base/file.h"
 #include "standalone/process/listening_sockets.h"
 
 #include <algorithm>
@@ -103,20 +104,29 @@ std::filesystem::path orderFile(const std::filesystem::path& folder, std::string
     return folder / (std::string(daemon) + ".order");
 }
 
-std::optional<DaemonState> loadDaemonState(const std::filesystem::path& file) {
-    std::ifstream input(file);
+Result<std::optional<DaemonState>> readDaemonState(const std::filesystem::path& file) {
+    const std::string boot = bootId();
+    if (boot.empty()) {
+        return Error("cannot tell since when the machine runs");
+    }
+    VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(file));
+    std::istringstream input(text.value_or(""));
     std::string line;
     if (!std::getline(input, line) || line != firstLine) {
         return std::nullopt;
     }
-    if (!std::getline(input, line) || line != std::string(bootKey) + bootId()) {
+    if (!std::getline(input, line) || line != std::string(bootKey) + boot) {
         return std::nullopt;
     }
     DaemonState state;
     while (std::getline(input, line)) {
         takeLine(line, state);
     }
-    return state;
+    return std::optional(std::move(state));
+}
+
+std::optional<DaemonState> loadDaemonState(const std::filesystem::path& file) {
+    return readDaemonState(file).valueOr(std::nullopt);
 }
 
 Result<> storeDaemonState(const std::filesystem::path& file, const DaemonState& state) {

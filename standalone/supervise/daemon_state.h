@@ -38,7 +38,10 @@ std::filesystem::path lockFile(const std::filesystem::path& folder, std::string_
 std::filesystem::path orderFile(const std::filesystem::path& folder, std::string_view daemon);
 
 /// Nothing when there is no such file, not one of this form, or one from before the machine started: its
-/// processes are gone, and others may have their numbers.
+/// processes are gone, and others may have their numbers. An error when that cannot be told.
+Result<std::optional<DaemonState>> readDaemonState(const std::filesystem::path& file);
+
+/// The same for those who only want to tell somebody: nothing when it cannot be told.
 std::optional<DaemonState> loadDaemonState(const std::filesystem::path& file);
 
 /// Replaces the file; it is whole at every moment.

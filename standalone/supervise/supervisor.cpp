@@ -65,7 +65,7 @@ Result<> Supervisor::begin(const DaemonOrder& order) {
     if (!signals_) {
         return Error(std::string("cannot wait for signals: ") + std::strerror(errno));
     }
-    const auto former = loadDaemonState(stateFile(folder_, name_));
+    VELT_ASSIGN_OR_RETURN(const auto former, readDaemonState(stateFile(folder_, name_)));
     if (former && !endLeftovers(*former)) {
         return Error("the former daemon, process " + std::to_string(former->daemon.pid) + ", did not end");
     }
@@ -73,6 +73,9 @@ Result<> Supervisor::begin(const DaemonOrder& order) {
     control_.emplace(std::move(control));
     order_ = order;
     auto started = startDaemon(deadline);
+    if (started && !published_) {
+        started = published_; // a daemon that nobody knows of could not be ended
+    }
     if (!started) {
         control_.reset();
         endProcesses([] { return descendantsOf(::getpid()); }, patience);
@@ -253,8 +256,9 @@ void Supervisor::publish(RunState state, std::string reason) {
     std::erase(record.sessions, daemon_.id());
     record.reason = std::move(reason);
     tellServiceManager(statusLine(record));
-    if (const auto written = storeDaemonState(stateFile(folder_, name_), record); !written) {
-        ::syslog(LOG_ERR, "%s", written.error().message.c_str());
+    published_ = storeDaemonState(stateFile(folder_, name_), record);
+    if (!published_) {
+        ::syslog(LOG_ERR, "%s", published_.error().message.c_str());
     }
 }
 

@@ -63,6 +63,7 @@ private:
     BackOff backOff_;
     std::uint64_t restarts_ = 0; ///< after the daemon had ended by itself
     std::optional<Clock::time_point> restartAt_;
+    Result<> published_; ///< whether the state file says what is so
     bool finished_ = false;
 };
 

@@ -121,7 +121,8 @@ SeenCall describe(const seccomp_notif& request, pid_t child) {
     const auto process = static_cast<pid_t>(request.pid);
     std::string program = contentsOf(procFile(process, "comm"));
     program.resize(program.empty() ? 0 : program.size() - 1);
-    const bool ofChild = std::filesystem::exists(procFile(child, "task/" + std::to_string(process)));
+    const bool ofChild =
+        process == child || std::filesystem::exists(procFile(child, "task/" + std::to_string(process)));
     return {call.name, subjectOf(call, request), program, ofChild, call.error};
 }
 
@@ -210,6 +211,7 @@ void CallWatch::answerOne() {
     const std::lock_guard lock(mutex_);
     const int error = decide_ ? decide_(describe(request, child_)) : 0;
     if (error != 0) {
+        decide_ = {};
         answer.flags = 0;
         answer.error = failsInSilence(request.data.nr) ? 0 : -error;
     }

@@ -35,7 +35,7 @@ struct ChildEnd {
 class CallWatch {
 public:
     /// The error number with which the call is to fail; 0 to let it be made. Called on a thread of the
-    /// watch's, one call at a time.
+    /// watch's, one call at a time, and no more once a call has failed.
     using Decide = std::function<int(const SeenCall&)>;
 
     /// Runs `act` in a child, which ends with it, and asks about each of its calls. Throws where the kernel
