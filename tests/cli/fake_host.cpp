@@ -5,6 +5,7 @@
 
 #include <memory>
 #include <stdexcept>
+#include <utility>
 
 namespace {
 
@@ -73,7 +74,17 @@ FakeHost::FakeHost()
                           "anonymous_chroot_share": "", "enable_umask": false})")),
       sftp(jsonOf(R"({"enable": false, "portnum": 22})")) {}
 
+void FakeHost::answerWith(const std::string& request, HttpReply reply) {
+    const std::lock_guard lock(*mutex_);
+    scripted_[request] = std::move(reply);
+}
+
 HttpReply FakeHost::handle(const HttpRequest& request) {
+    const std::lock_guard lock(*mutex_);
+    return answer(request);
+}
+
+HttpReply FakeHost::answer(const HttpRequest& request) {
     const auto scripted = scripted_.find(request.method + " " + request.target);
     if (scripted != scripted_.end()) {
         return scripted->second;

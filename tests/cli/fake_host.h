@@ -1,5 +1,6 @@
 // The server's side of the API, with settings that can be read and changed, and scripted answers where a test
-// wants them.
+// wants them. A server answers from a thread of its own, and a client may be another process: the two are
+// kept apart by a lock, which copies share.
 #ifndef VELT_TESTS_CLI_FAKE_HOST_H
 #define VELT_TESTS_CLI_FAKE_HOST_H
 
@@ -8,6 +9,8 @@
 #include <json/value.h>
 
 #include <map>
+#include <memory>
+#include <mutex>
 #include <set>
 #include <string>
 #include <vector>
@@ -20,7 +23,7 @@ public:
     HttpReply handle(const HttpRequest& request);
 
     /// From now on the request "METHOD /target" gets this answer.
-    void answerWith(const std::string& request, HttpReply reply) { scripted_[request] = std::move(reply); }
+    void answerWith(const std::string& request, HttpReply reply);
 
     // What the server holds. Not for use while a request runs.
     Json::Value ftp;
@@ -36,12 +39,14 @@ public:
     bool tellsWanted = true;             ///< the status says what is switched on
 
 private:
+    HttpReply answer(const HttpRequest& request);
     HttpReply set(Json::Value& settings, const Json::Value& parameters,
                   const std::set<std::string>& required);
     Json::Value status() const;
     HttpReply saveRules(const Json::Value& parameters);
     HttpReply callMethod(const std::string& row, const Json::Value& parameters);
 
+    std::shared_ptr<std::mutex> mutex_ = std::make_shared<std::mutex>();
     std::map<std::string, HttpReply> scripted_;
 };
 
