@@ -113,6 +113,32 @@ protected:
                 (property.isMember("maximum") && value.asInt() > property["maximum"].asInt()));
     }
 
+    struct Operation {
+        std::string method;
+        std::string path;
+        Json::Value responses;
+    };
+
+    std::vector<Operation> operations() const {
+        std::vector<Operation> all;
+        for (const std::string& path : document["paths"].getMemberNames()) {
+            for (const std::string& method : document["paths"][path].getMemberNames()) {
+                std::string upper = method;
+                std::ranges::transform(upper, upper.begin(),
+                                       [](unsigned char c) { return static_cast<char>(std::toupper(c)); });
+                all.push_back({upper, path, document["paths"][path][method]["responses"]});
+            }
+        }
+        return all;
+    }
+
+    /// That the host gave the wanted answer, and that the description tells of it.
+    static void expectDescribed(const Operation& operation, int status, int wanted) {
+        EXPECT_EQ(status, wanted) << operation.method << " " << operation.path;
+        EXPECT_TRUE(operation.responses.isMember(std::to_string(wanted)))
+            << operation.method << " " << operation.path << " " << wanted;
+    }
+
     /// Every value that a parameter is tried with, right and wrong.
     static std::vector<Json::Value> values() {
         std::vector<Json::Value> all;
@@ -165,6 +191,43 @@ TEST_F(OpenApiTest, EveryOtherPathIsServedAsDescribed) {
                 EXPECT_EQ(violation(answerSchema(path, method.c_str()), answer.json()), "") << path;
             }
         }
+    }
+}
+
+/// What any request may get, whatever it asks for.
+TEST_F(OpenApiTest, EveryOperationTellsOfRefusalsThatComeBeforeIt) {
+    const std::string manyBytes = "Content-Length: 2000000\r\n";
+    for (const Operation& each : operations()) {
+        expectDescribed(each, ask(each.method, each.path).status, 401);
+        expectDescribed(each, ask(each.method, each.path, admin + "Origin: http://elsewhere\r\n").status,
+                        403);
+        expectDescribed(each, ask(each.method, each.path, admin + manyBytes).status, 413);
+        const std::string pad = "X-Pad: " + std::string(limits.head, 'a') + "\r\n";
+        expectDescribed(each, ask(each.method, each.path, admin + pad).status, 431);
+        expectDescribed(
+            each, connect().ask(each.method + " " + each.path + " HTTP/1.1\r\n" + admin + "\r\n").status,
+            400);
+        EXPECT_TRUE(each.responses.isMember("503")) << each.path;
+    }
+    const auto anHour = std::chrono::system_clock::now() + std::chrono::hours(1);
+    FakeStandalone::instance().bans = {{velt::parseIpNetwork("127.0.0.1").value(), anHour, "sftp", 10}};
+    for (const Operation& each : operations()) {
+        expectDescribed(each, ask(each.method, each.path, admin).status, 429);
+    }
+}
+
+TEST_F(OpenApiTest, EveryOperationTellsOfBodiesThatDoNotArrive) {
+    stop();
+    limits.bodyTime = std::chrono::milliseconds(200);
+    start();
+    const std::vector<Operation> all = operations();
+    std::vector<Client> clients;
+    for (const Operation& each : all) {
+        clients.push_back(connect());
+        clients.back().send(requestText(each.method, each.path, admin + "Content-Length: 10\r\n"));
+    }
+    for (std::size_t i = 0; i < all.size(); ++i) {
+        expectDescribed(all[i], clients[i].receive().status, 408);
     }
 }
 
