@@ -4,18 +4,32 @@
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/waiting.h"
 
 #include <sys/resource.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <concepts>
 #include <deque>
 #include <thread>
 
 namespace {
 
 using std::chrono::milliseconds;
+using std::chrono::seconds;
+using velt::test::Clock;
 
 const std::string target = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
+
+/// How long it takes when nothing else delays it: the shortest of several times.
+template<std::invocable Work> milliseconds shortestTimeOf(const Work& work) {
+    milliseconds shortest = milliseconds::max();
+    for (int i = 0; i < 5; ++i) {
+        shortest = std::min(shortest, velt::test::timeOf(work));
+    }
+    return shortest;
+}
 
 class HostLimits : public HostTest {
 protected:
@@ -115,11 +129,13 @@ TEST_F(HostLimits, ATrickledHeadTimesOut) {
     limits.headTime = milliseconds(300);
     start();
     Client client = connect();
-    const auto begin = std::chrono::steady_clock::now();
-    for (int i = 0; i < 100 && client.send("G"); ++i) {
+    // It would go on for 40 s.
+    int sent = 0;
+    while (sent < 2000 && client.send("G")) {
+        ++sent;
         std::this_thread::sleep_for(milliseconds(20));
     }
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(2500));
+    EXPECT_LT(sent, 2000);
     EXPECT_EQ(client.receive().status, 408);
 }
 
@@ -186,6 +202,11 @@ TEST_F(HostLimits, ConnectionsBeyondTheLimitAreToldSo) {
 TEST_F(HostLimits, OneTokenLocksOutNobody) {
     ASSERT_EQ(velt::host::makeRoomForConnections(3000), 3000U) << "the test needs more descriptors";
     start();
+    const auto askAsRoot = [this] {
+        Client root = Client::unixSocket(socketPath);
+        EXPECT_EQ(root.ask(requestText("GET", target + "get")).status, 200);
+    };
+    const auto alone = shortestTimeOf(askAsRoot);
     std::deque<Client> open;
     for (int i = 0; i < 1000; ++i) {
         open.push_back(connect());
@@ -196,10 +217,8 @@ TEST_F(HostLimits, OneTokenLocksOutNobody) {
         open.back().send("POST " + target + "get HTTP/1.1\r\nHost: localhost\r\n" + viewer +
                          "Content-Length: 100\r\n\r\n{");
     }
-    const auto begin = std::chrono::steady_clock::now();
-    Client root = Client::unixSocket(socketPath);
-    EXPECT_EQ(root.ask(requestText("GET", target + "get")).status, 200);
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(100));
+    EXPECT_EQ(open.back().receive().status, 429) << "all before it have been heard";
+    EXPECT_LT(shortestTimeOf(askAsRoot), 10 * alone + milliseconds(50));
     EXPECT_EQ(get("/healthz").status, 200) << "another token";
 }
 
@@ -270,16 +289,17 @@ TEST_F(HostLimits, WhoOnlyConnectsGivesWay) {
 TEST_F(HostLimits, ManyWrongTokensKeepNobodyOut) {
     limits.connections = 100;
     limits.delayedRefusals = 10;
-    limits.refusalDelay = std::chrono::seconds(3);
+    limits.refusalDelay = seconds(3);
     start();
-    const auto begin = std::chrono::steady_clock::now();
+    const auto begin = Clock::now();
     std::deque<Client> guesses;
     for (int i = 0; i < 300; ++i) {
         guesses.push_back(connect());
         guesses.back().send(requestText("GET", "/healthz", "Authorization: Bearer guess\r\n"));
     }
+    const auto asked = Clock::now();
     EXPECT_EQ(get("/healthz").status, 200);
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+    EXPECT_LT(Clock::now() - asked, limits.refusalDelay) << "it does not wait for those that wait";
     int refused = 0;
     for (Client& guess : guesses) {
         const int status = guess.receive().status;
@@ -287,14 +307,23 @@ TEST_F(HostLimits, ManyWrongTokensKeepNobodyOut) {
         refused += status == 401;
     }
     EXPECT_GE(refused, 100) << "who gave way got no answer, the others did";
-    EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3)) << "those that wait do wait";
+    EXPECT_GE(Clock::now() - begin, limits.refusalDelay) << "those that wait do wait";
 }
 
 TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
     // Of this test there are as many descriptors as of the host.
     ASSERT_EQ(velt::host::makeRoomForConnections(2000), 2000U) << "the test needs more descriptors";
     limits.connections = 1010;
+    limits.headTime = seconds(100);
+    limits.idleTime = seconds(100);
     start();
+    const auto askOften = [this] {
+        Client client = connect();
+        for (int i = 0; i < 20; ++i) {
+            ASSERT_EQ(client.ask(requestText("GET", target + "get", admin)).status, 200);
+        }
+    };
+    const auto alone = shortestTimeOf(askOften);
     std::deque<Client> idle;
     for (int i = 0; i < 1000; ++i) {
         idle.push_back(connect());
@@ -304,16 +333,11 @@ TEST_F(HostLimits, AThousandIdleConnectionsBlockNobody) {
             idle.back().send("GET /heal");
         }
     }
-    const auto begin = std::chrono::steady_clock::now();
-    Client client = connect();
-    for (int i = 0; i < 100; ++i) {
-        ASSERT_EQ(client.ask(requestText("GET", target + "get", admin)).status, 200);
-    }
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(10));
+    EXPECT_LT(shortestTimeOf(askOften), 10 * alone + milliseconds(50));
     EXPECT_EQ(idle[0].ask("thz HTTP/1.1\r\nHost: localhost\r\n" + admin + "\r\n").status, 200);
-    const auto end = std::chrono::steady_clock::now();
+    const auto end = Clock::now();
     stop();
-    EXPECT_LT(std::chrono::steady_clock::now() - end, std::chrono::seconds(5));
+    EXPECT_LT(Clock::now() - end, seconds(10)) << "whoever is idle is not waited for";
 }
 
 /// Never returns: a hard limit that was lowered does not rise again.

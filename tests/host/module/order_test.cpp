@@ -4,14 +4,20 @@
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/waiting.h"
 
+#include <poll.h>
+
+#include <algorithm>
 #include <atomic>
+#include <fstream>
 #include <future>
 #include <thread>
 
 namespace {
 
 using std::chrono::milliseconds;
+using std::chrono::seconds;
 using velt::host::RequestOrder;
 using Kind = RequestOrder::Kind;
 
@@ -32,6 +38,32 @@ protected:
                 client.ask(requestText("POST", "/api/VELT.Test.Order/v1/" + method, admin)).status == status;
         }
         return good;
+    }
+
+    /// A call that lasts until letGo().
+    std::string callThatLasts(const std::string& method) const {
+        return requestText("POST", "/api/VELT.Test.Order/v1/" + method, admin,
+                           R"({"folder":")" + folder.string() + "\"}");
+    }
+
+    /// Waits until so many of these calls run.
+    ::testing::AssertionResult running(int count) const {
+        const auto begun = [this] {
+            return std::ranges::count_if(std::filesystem::directory_iterator(folder), [](const auto& entry) {
+                return entry.path().filename().string().starts_with("begun-");
+            });
+        };
+        return velt::test::waitUntil([&] { return begun() == count; }, seconds(20))
+                   ? ::testing::AssertionSuccess()
+                   : ::testing::AssertionFailure() << begun() << " run";
+    }
+
+    void letGo() const { std::ofstream(folder / "go"); }
+
+    /// Whether there is something to receive, by now.
+    static bool isAnswered(const Client& client) {
+        pollfd waiting{client.descriptor(), POLLIN, 0};
+        return poll(&waiting, 1, 0) == 1;
     }
 };
 
@@ -61,13 +93,13 @@ TEST_F(HostOrder, TwoWritersAndManyReaders) {
 TEST_F(HostOrder, ALongWriteDelaysNothingButTheModule) {
     start();
     Client writer = connect();
-    writer.send(requestText("POST", "/api/VELT.Test.Order/v1/wait", admin, R"({"milliseconds":700})"));
-    std::this_thread::sleep_for(milliseconds(100));
-    const auto begin = std::chrono::steady_clock::now();
+    writer.send(callThatLasts("wait"));
+    ASSERT_TRUE(running(1));
     for (int i = 0; i < 20; ++i) {
         EXPECT_EQ(get("/healthz").status, 200);
     }
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(500));
+    EXPECT_FALSE(isAnswered(writer)) << "it lasted all the time";
+    letGo();
     EXPECT_EQ(writer.receive().status, 204);
 }
 
@@ -77,15 +109,14 @@ TEST_F(HostOrder, ModulesThatBlockAllTheirThreadsDelayNothingElse) {
     std::vector<Client> readers;
     for (int i = 0; i < 4; ++i) {
         readers.push_back(connect());
-        readers.back().send(
-            requestText("POST", "/api/VELT.Test.Order/v1/get_wait", admin, R"({"milliseconds":600})"));
+        readers.back().send(callThatLasts("get_wait"));
     }
-    std::this_thread::sleep_for(milliseconds(100));
-    const auto begin = std::chrono::steady_clock::now();
+    ASSERT_TRUE(running(2));
     for (const char* target : {"/healthz", "/api", "/api/log", "/api/tokens", "/openapi.json"}) {
         EXPECT_EQ(get(target).status, 200) << target;
     }
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, milliseconds(400));
+    EXPECT_TRUE(std::ranges::none_of(readers, isAnswered)) << "all threads were blocked all the time";
+    letGo();
     for (Client& reader : readers) {
         EXPECT_EQ(reader.receive().status, 204);
     }
@@ -94,9 +125,13 @@ TEST_F(HostOrder, ModulesThatBlockAllTheirThreadsDelayNothingElse) {
 TEST_F(HostOrder, AStopFinishesWhatRuns) {
     start();
     Client client = connect();
-    client.send(requestText("POST", "/api/VELT.Test.Order/v1/wait", admin, R"({"milliseconds":500})"));
-    std::this_thread::sleep_for(milliseconds(100));
+    client.send(callThatLasts("wait"));
+    ASSERT_TRUE(running(1));
+    Client idle = connect();
+    EXPECT_EQ(idle.ask(requestText("GET", "/healthz", admin)).status, 200);
     std::thread stopper([this] { stop(); });
+    EXPECT_TRUE(idle.ended()) << "the stop has begun";
+    letGo();
     const Answer answer = client.receive();
     EXPECT_EQ(answer.status, 204);
     EXPECT_EQ(answer.header("connection"), "close");
@@ -110,10 +145,13 @@ TEST_F(HostOrder, TooManyWaitingRequestsAreTurnedAway) {
     std::vector<Client> clients;
     for (int i = 0; i < 5; ++i) {
         clients.push_back(connect());
-        clients.back().send(
-            requestText("POST", "/api/VELT.Test.Order/v1/wait", admin, R"({"milliseconds":300})"));
-        std::this_thread::sleep_for(milliseconds(30));
+        clients.back().send(callThatLasts("wait"));
+        ASSERT_TRUE(running(1));
     }
+    EXPECT_TRUE(
+        velt::test::waitUntil([&] { return std::ranges::count_if(clients, isAnswered) == 2; }, seconds(20)))
+        << "one runs and two wait";
+    letGo();
     int refused = 0;
     for (Client& client : clients) {
         const Answer answer = client.receive();
@@ -194,8 +232,8 @@ TEST(RequestOrder, SearchesDelayNothingElse) {
     std::promise<void> ordered;
     ASSERT_TRUE(order.submit(Kind::unordered, [&] { unordered.set_value(); }));
     ASSERT_TRUE(order.submit(Kind::write, [&] { ordered.set_value(); }));
-    EXPECT_EQ(unordered.get_future().wait_for(std::chrono::seconds(10)), std::future_status::ready);
-    EXPECT_EQ(ordered.get_future().wait_for(std::chrono::seconds(10)), std::future_status::ready);
+    EXPECT_EQ(unordered.get_future().wait_for(seconds(10)), std::future_status::ready);
+    EXPECT_EQ(ordered.get_future().wait_for(seconds(10)), std::future_status::ready);
     release.set_value();
     order.stop();
     EXPECT_EQ(most, 1);

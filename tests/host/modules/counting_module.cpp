@@ -4,6 +4,9 @@
 
 #include <atomic>
 #include <chrono>
+#include <filesystem>
+#include <fstream>
+#include <string>
 #include <thread>
 
 namespace {
@@ -59,9 +62,19 @@ void set(VELT::APIRequest*, VELT::APIResponse* response) {
     response->SetSuccess(Json::Value());
 }
 
+/// Notes its beginning in a folder, and lasts until there is a file "go", or fails when nobody makes one.
 void wait(VELT::APIRequest* request, VELT::APIResponse* response) {
-    std::this_thread::sleep_for(std::chrono::milliseconds(request->GetParam("milliseconds", 100).asInt()));
-    response->SetSuccess(Json::Value());
+    static std::atomic<int> calls{0};
+    const std::filesystem::path folder = request->GetParam("folder", "").asString();
+    const std::ofstream begun(folder / ("begun-" + std::to_string(++calls)));
+    for (int i = 0; i < 12000 && !std::filesystem::exists(folder / "go"); ++i) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    if (std::filesystem::exists(folder / "go")) {
+        response->SetSuccess(Json::Value());
+    } else {
+        response->SetError(1902, Json::Value());
+    }
 }
 
 const VELT::APITableRow table[] = {

@@ -181,7 +181,7 @@ TEST_F(PortConflictTest, TheDaemonAndItsSessionsAreNotInTheirOwnWay) {
     const int second = freePort();
     planDouble().ftpOptions = {"--port", std::to_string(second)};
     ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
-    ASSERT_TRUE(waitUntil([&] { return accepts(second); }, std::chrono::seconds(1)));
+    ASSERT_TRUE(waitUntil([&] { return accepts(second); }, patience));
     expectNoConflict("ftp", second, second);
     expectNoConflict("ftp", ftpPort_, ftpPort_);
     expectConflict("ssh", second, second, second,

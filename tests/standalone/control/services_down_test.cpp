@@ -94,13 +94,13 @@ TEST_F(ServicesDownTest, ARefusedRestartLeavesFormerSettingsInForce) {
 TEST_F(ServicesDownTest, ADaemonThatKeepsCrashingTellsItsLastEnd) {
     startAndCrash();
     const Down expected{{"ftp", "The FTP daemon does not run: velt-test-daemon: told to end.", false, "FTP"}};
-    EXPECT_TRUE(waitUntil([&expected] { return servicesDown() == expected; }, seconds(5)))
+    EXPECT_TRUE(waitUntil([&expected] { return servicesDown() == expected; }, patience))
         << testing::PrintToString(servicesDown());
 }
 
 TEST_F(ServicesDownTest, RestartsAreCountedByDaemon) {
     startAndCrash();
-    EXPECT_TRUE(waitUntil([] { return daemonRestarts().at("ftp") >= 2; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([] { return daemonRestarts().at("ftp") >= 2; }, patience));
     EXPECT_EQ(daemonRestarts().at("sftp"), 0U);
     EXPECT_EQ(daemonRestarts().size(), allDaemons().size());
 }

@@ -228,10 +228,10 @@ TEST_F(ServicesTest, AliveIsTheProcessAndNotItsFile) {
     ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
     const DaemonState state = serviceState("sftp");
     signalProcess(state.supervisor, SIGKILL);
-    ASSERT_TRUE(waitUntil([&] { return !isAlive(state.supervisor); }, seconds(1)));
+    ASSERT_TRUE(waitUntil([&] { return !isAlive(state.supervisor); }, patience));
     EXPECT_NE(VELTSFTPIsAlive(), 0);
     signalProcess(state.daemon, SIGKILL);
-    ASSERT_TRUE(waitUntil([&] { return !isAlive(state.daemon); }, seconds(1)));
+    ASSERT_TRUE(waitUntil([&] { return !isAlive(state.daemon); }, patience));
     EXPECT_EQ(VELTSFTPIsAlive(), 0);
 }
 

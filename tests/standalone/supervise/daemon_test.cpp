@@ -86,12 +86,11 @@ void DaemonTest::SetUp() {
 }
 
 void DaemonTest::TearDown() {
-    EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, std::chrono::seconds(2)))
-        << "a process was left behind";
+    EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, patience)) << "a process was left behind";
     for (const ProcessId& process : leftProcesses()) {
         signalProcess(process, SIGKILL);
     }
-    waitUntil([] { return leftProcesses().empty(); }, std::chrono::seconds(2));
+    waitUntil([] { return leftProcesses().empty(); }, patience);
     std::filesystem::remove_all(root_);
 }
 
