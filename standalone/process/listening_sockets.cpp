@@ -3,7 +3,9 @@
 #include "base/file.h"
 #include "base/text.h"
 #include "standalone/process/process_identity.h"
+#include "standalone/process/socket_diagnosis.h"
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -51,6 +53,15 @@ Result<> addSockets(const std::string& table, std::vector<ListeningSocket>& sock
         sockets.push_back(socket);
     }
     return {};
+}
+
+/// Whether the process is seen to live in the network of the calling thread.
+bool sharesNetwork(pid_t pid) {
+    struct stat own {};
+    struct stat its {};
+    return ::stat("/proc/thread-self/ns/net", &own) == 0 &&
+           ::stat(("/proc/" + std::to_string(pid) + "/ns/net").c_str(), &its) == 0 &&
+           own.st_dev == its.st_dev && own.st_ino == its.st_ino;
 }
 
 /// The inode of the socket behind an entry of /proc/PID/fd.
@@ -114,6 +125,11 @@ std::string programOf(pid_t pid) {
 } // namespace
 
 Result<std::vector<ListeningSocket>> listeningSockets(pid_t pid) {
+    if (pid == 0 || sharesNetwork(pid)) {
+        if (auto diagnosed = diagnoseListeningSockets()) {
+            return *std::move(diagnosed);
+        }
+    }
     // "/proc/net" is the calling process's own; a thread could live in another namespace than its process.
     const std::string folder = pid == 0 ? "/proc/thread-self/net" : "/proc/" + std::to_string(pid) + "/net";
     std::vector<ListeningSocket> sockets;

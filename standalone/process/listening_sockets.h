@@ -1,4 +1,4 @@
-// Who listens on which TCP port, read from the kernel's tables; no connection is made.
+// Who listens on which TCP port, as the kernel tells; no connection is made.
 #ifndef VELT_STANDALONE_PROCESS_LISTENING_SOCKETS_H
 #define VELT_STANDALONE_PROCESS_LISTENING_SOCKETS_H
 

@@ -9,6 +9,7 @@
 #include "tests/support/result.h"
 
 #include <netinet/in.h>
+#include <sched.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
 #include <sys/wait.h>
@@ -81,6 +82,50 @@ TEST(ListeningSockets, AreFoundOfAProcessThatHidesThem) {
     ASSERT_EQ(::waitpid(asker, &status, 0), asker);
     ASSERT_TRUE(WIFEXITED(status));
     EXPECT_EQ(WEXITSTATUS(status), 1);
+}
+
+bool listenOn(int family, int port) {
+    const int listener = ::socket(family, SOCK_STREAM, 0);
+    const int on = 1;
+    sockaddr_in6 address{}; // of both families the port is at the same place
+    address.sin6_family = static_cast<sa_family_t>(family);
+    address.sin6_port = htons(static_cast<in_port_t>(port));
+    return (family == AF_INET || ::setsockopt(listener, IPPROTO_IPV6, IPV6_V6ONLY, &on, sizeof on) == 0) &&
+           ::bind(listener, reinterpret_cast<const sockaddr*>(&address),
+                  family == AF_INET ? sizeof(sockaddr_in) : sizeof address) == 0 &&
+           ::listen(listener, 1) == 0;
+}
+
+TEST(ListeningSockets, AreThoseOfTheNetworkInWhichTheProcessLives) {
+    if (::geteuid() != 0) {
+        GTEST_SKIP() << "only root can make a network";
+    }
+    const int port = freePort();
+    const int otherPort = freePort();
+    std::array<int, 2> ready{};
+    std::array<int, 2> end{};
+    ASSERT_TRUE(::pipe(ready.data()) == 0 && ::pipe(end.data()) == 0);
+    const pid_t elsewhere = ::fork();
+    char byte = 0;
+    if (elsewhere == 0) {
+        ::close(end[1]);
+        const bool listens =
+            ::unshare(CLONE_NEWNET) == 0 && listenOn(AF_INET, port) && listenOn(AF_INET6, otherPort);
+        ::_exit(listens && ::write(ready[1], "x", 1) == 1 && ::read(end[0], &byte, 1) == 0 ? 0 : 1);
+    }
+    ::close(ready[1]);
+    EXPECT_EQ(::read(ready[0], &byte, 1), 1) << "it listens";
+    EXPECT_TRUE(listensOn(elsewhere, port));
+    EXPECT_TRUE(listensOn(elsewhere, otherPort));
+    for (const ListeningSocket& socket : listeningSockets().valueOr({})) {
+        EXPECT_TRUE(socket.port != port && socket.port != otherPort) << "nobody listens there here";
+    }
+    ::close(end[1]);
+    int status = 0;
+    EXPECT_EQ(::waitpid(elsewhere, &status, 0), elsewhere);
+    EXPECT_EQ(status, 0);
+    ::close(ready[0]);
+    ::close(end[0]);
 }
 
 TEST(ListeningSockets, HaveAnOwner) {
