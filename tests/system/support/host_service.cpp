@@ -70,10 +70,12 @@ void HostService::TearDown() {
 
 void HostService::startHost() {
     const std::string built = VELT_BUILT_FOLDER;
+    Words words{
+        built + "/veltd", "--state-root", worldRoot,      "--module", built + "/VELT.Core.FileServ.FTP.so",
+        "--listen",       "127.0.0.1:0",  "--print-ready"};
+    words.insert(words.end(), hostArguments.begin(), hostArguments.end());
     host = RunningProgram::start(
-        {built + "/veltd", "--state-root", worldRoot, "--module", built + "/VELT.Core.FileServ.FTP.so",
-         "--listen", "127.0.0.1:0", "--print-ready"},
-        {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LANG=C.UTF-8", "VELT_LIBEXEC_DIR=" + built}, logFile);
+        words, {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LANG=C.UTF-8", "VELT_LIBEXEC_DIR=" + built}, logFile);
     const Json::Value ready = jsonOf(host.readUntil("\n"));
     ASSERT_TRUE(ready.isObject()) << hostLog();
     const std::string address = ready["listen"][0].asString();

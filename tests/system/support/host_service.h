@@ -69,6 +69,7 @@ protected:
     /// What the host wrote to its standard error so far.
     static std::string hostLog();
 
+    Words hostArguments; ///< of veltd, beside the usual ones
     RunningProgram host;
     int tcpPort = 0;
     std::string adminToken;
