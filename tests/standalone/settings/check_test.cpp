@@ -54,6 +54,19 @@ TEST(CheckFtp, ThePortIsADecimalNumberFrom1To65535) {
               "The FTP setting portnum is \"21\\x0aX\"; expected a number from 1 to 65535.");
 }
 
+TEST(ControlPort, IsNoneWhereTheTextIsNotTheOneFormOfAPort) {
+    const auto portIn = [](const char* text) {
+        FtpSettings settings = defaultFtpSettings();
+        port(text)(settings);
+        return controlPort(settings.record);
+    };
+    EXPECT_EQ(portIn("21"), 21);
+    EXPECT_EQ(portIn("65535"), 65535);
+    for (const char* text : {"", "0", "021", "0021", "65536", "-1", "21 ", "21x"}) {
+        EXPECT_EQ(portIn(text), 0) << text;
+    }
+}
+
 TEST(CheckFtp, TextsEndWithinTheirFields) {
     EXPECT_EQ(problemAfter(port("00000021")), "The FTP setting portnum is longer than 7 bytes.");
     EXPECT_EQ(problemAfter([](FtpSettings& settings) {

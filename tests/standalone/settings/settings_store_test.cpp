@@ -1,4 +1,5 @@
 #include "platform/core.h"
+#include "platform/sftp.h"
 #include "standalone/settings/settings.h"
 #include "standalone/settings/settings_files.h"
 #include "standalone/standalone.h"
@@ -67,6 +68,18 @@ TEST_F(SettingsStore, AHandEditedValueThatNoDaemonTakesIsRepairedByStoringAGoodO
     EXPECT_LT(VELTFTPASCIIEnabledSet(1), 0);
     EXPECT_GE(VELTFTPTimeOutSet(30), 0);
     EXPECT_GE(VELTFTPASCIIEnabledSet(1), 0);
+}
+
+TEST_F(SettingsStore, TheDaemonIsAskedAboutSftpSettingsThatItIsToServe) {
+    ASSERT_GE(VELTSFTPConfigSet(0, 2201), 0) << lastErrorSentence();
+    EXPECT_EQ(test::fakeCandidate().sftp.size(), 0U) << "what is off may need what is not there yet";
+    ASSERT_GE(VELTSFTPConfigSet(1, 2202), 0) << lastErrorSentence();
+    ASSERT_EQ(test::fakeCandidate().sftp.size(), 1U);
+    EXPECT_EQ(test::fakeCandidate().sftp[0].port, 2202);
+    test::fakeCandidate().refuses = true;
+    EXPECT_LT(VELTSFTPConfigSet(1, 2203), 0);
+    EXPECT_EQ(lastErrorSentence(), "The daemon does not take it.");
+    EXPECT_EQ(loadSftpSettings()->port, 2202);
 }
 
 } // namespace
