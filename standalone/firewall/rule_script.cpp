@@ -1,6 +1,7 @@
 #include "standalone/firewall/rule_script.h"
 
 #include "base/file.h"
+#include "base/plain_text.h"
 #include "base/text.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
@@ -9,6 +10,12 @@
 #include "standalone/process/run_program.h"
 
 namespace velt {
+
+namespace {
+
+constexpr std::size_t longestReason = 400;
+
+} // namespace
 
 bool mayTouchRules() {
     return statePath("/") == "/" || fileExists(statePath(paths::firewallSettings));
@@ -20,8 +27,8 @@ Result<> runRuleScript(const std::string& script) {
         return {};
     }
     const std::string errors = result ? result->errors : result.error().message;
-    std::string reason(
-        trimmedEnd(errors.substr(0, errors.find('\n')), ". ")); // it may be a sentence of its own
+    // It may be a sentence of its own.
+    std::string reason(trimmedEnd(plainText(errors.substr(0, errors.find('\n')), longestReason), ". "));
     reason = reasonOfEnd(reason, result ? result->exitCode : 0);
     if (reason.find("Operation not permitted") != std::string::npos) {
         reason = "this process is not allowed to change the firewall";

@@ -1,5 +1,6 @@
 #include "standalone/process/last_words.h"
 
+#include "base/plain_text.h"
 #include "base/text.h"
 
 #include <algorithm>
@@ -9,6 +10,8 @@
 
 namespace velt {
 namespace {
+
+constexpr std::size_t longestWords = 400;
 
 /// "2026-01-31 12:00:00,123 host proftpd[42] address: ..." begins each line of ProFTPD's.
 std::string withoutPrefix(std::string line) {
@@ -44,7 +47,7 @@ std::string lastWords(const std::string& errors) {
             break;
         }
     }
-    return std::string(trimmedEnd(withoutPrefix(std::move(words)), "\r ."));
+    return plainText(trimmedEnd(withoutPrefix(std::move(words)), "\r ."), longestWords);
 }
 
 std::string reasonOfEnd(std::string words, int status, const std::string& program) {

@@ -9,7 +9,7 @@
 namespace velt {
 
 /// The one line of what a daemon wrote to its standard error that explains its end best, without time,
-/// process, host and full stop; "" when it wrote nothing.
+/// process, host and full stop, as plain text of at most 400 bytes; "" when it wrote nothing.
 std::string lastWords(const std::string& errors);
 
 /// These words, or "it ended with status 3" where there are none.

@@ -127,6 +127,7 @@ Result<ProcessResult> runProcess(std::vector<std::string> arguments, std::string
         return Error(program + " cannot be watched and was ended.");
     if (!ended) {
         result.ranTooLong = true;
+        result.errors += result.errors.empty() || result.errors.ends_with('\n') ? "" : "\n";
         result.errors +=
             program + " ran for more than " + std::to_string(limit.count()) + " ms and was ended.";
     }

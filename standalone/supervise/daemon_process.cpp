@@ -25,6 +25,9 @@ namespace {
 
 constexpr std::size_t keptLines = 20; // the reason comes first, and advice after it
 constexpr std::size_t longestLine = 400;
+// More than a pipe holds: a daemon that writes faster than it is read must not keep its supervisor from
+// everything else.
+constexpr int messagesAtOnce = 64;
 
 } // namespace
 
@@ -118,7 +121,7 @@ std::string DaemonProcess::takeLastWords() {
 
 void DaemonProcess::readOutput() {
     std::array<char, PIPE_BUF> buffer{};
-    for (;;) {
+    for (int left = messagesAtOnce; left > 0; --left) {
         const ssize_t length = ::read(output_.readEnd.get(), buffer.data(), buffer.size());
         if (length <= 0) {
             return;

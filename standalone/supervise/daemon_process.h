@@ -38,7 +38,8 @@ public:
     /// To be told when the daemon was reaped with this status; returns why it ended.
     Error ended(int waitStatus);
 
-    /// Becomes readable when the daemon has written something, which readOutput() then takes.
+    /// Becomes readable when the daemon has written something, which readOutput() then takes, as far as it is
+    /// there.
     int outputDescriptor() const { return output_.readEnd.get(); }
     void readOutput();
 

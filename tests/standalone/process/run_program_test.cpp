@@ -62,6 +62,15 @@ TEST(RunProcess, EndsAProgramThatRunsTooLong) {
     EXPECT_EQ(::waitpid(-1, nullptr, WNOHANG), -1) << "no child is left";
 }
 
+TEST(RunProcess, EndsAProgramThatNeverStopsWriting) {
+    for (const char* const command : {"cat /dev/zero & exec cat /dev/zero", "exec yes >&2"}) {
+        const auto begin = std::chrono::steady_clock::now();
+        const auto result = runProcess({"sh", "-c", command}, {}, 200ms);
+        EXPECT_LT(std::chrono::steady_clock::now() - begin, 5s);
+        EXPECT_TRUE(result->ranTooLong);
+    }
+}
+
 TEST(RunProcess, DoesNotWaitForAGrandchildThatHoldsTheOutput) {
     const auto begin = std::chrono::steady_clock::now();
     const auto result = runProcess({"sh", "-c", "sleep 30 & echo $!"});
