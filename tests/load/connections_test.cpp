@@ -4,6 +4,7 @@
 #include "tests/support/waiting.h"
 
 #include <atomic>
+#include <ctime>
 #include <deque>
 #include <iostream>
 #include <thread>
@@ -17,7 +18,7 @@ using std::chrono::milliseconds;
 constexpr std::size_t streamsOfOne = 32; ///< the most that one token may have
 constexpr std::size_t idleOfOne = 50;
 
-/// How late this machine wakes a thread: what no answer can be faster than.
+/// How much longer than alone a thread takes now that sleeps and then computes for a few milliseconds.
 class Sluggishness {
 public:
     Sluggishness() : thread_([this] { measure(); }) {}
@@ -35,12 +36,24 @@ public:
     }
 
 private:
+    static microseconds processorTime() {
+        timespec time{};
+        clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
+        return std::chrono::seconds(time.tv_sec) +
+               std::chrono::duration_cast<microseconds>(std::chrono::nanoseconds(time.tv_nsec));
+    }
+
     void measure() {
-        constexpr milliseconds nap(1);
+        constexpr milliseconds nap(20);
+        constexpr milliseconds work(3);
         while (!ended_) {
             const auto began = Clock::now();
             std::this_thread::sleep_for(nap);
-            worst_ = std::max(worst_, std::chrono::duration_cast<microseconds>(Clock::now() - began - nap));
+            const auto done = processorTime() + work;
+            while (processorTime() < done) {
+            }
+            const auto taken = std::chrono::duration_cast<microseconds>(Clock::now() - began);
+            worst_ = std::max(worst_, taken - nap - work);
         }
     }
 
@@ -93,8 +106,7 @@ protected:
         return durations;
     }
 
-    /// An answer takes a few threads that are woken one after the other, so a machine that is late by so much
-    /// may delay it by several times that.
+    /// Several threads take part in an answer, and each may be late by so much.
     static void expectWithin(const Durations& durations, milliseconds promised, microseconds late) {
         if (isLong()) {
             EXPECT_LT(durations.worst(), promised + 3 * late);

@@ -120,7 +120,10 @@ Holdings LoadService::holdings() const {
         (process == host.pid() ? all.hostKilobytes : all.othersKilobytes) += statusValue(folder, "VmRSS:");
     }
     const fs::recursive_directory_iterator files(worldRoot);
-    all.files = static_cast<int>(std::distance(begin(files), end(files)));
+    all.files =
+        static_cast<int>(std::count_if(begin(files), end(files), [](const fs::directory_entry& entry) {
+            return entry.path().parent_path() != worldRoot / "var/log/velt";
+        }));
     return all;
 }
 

@@ -26,7 +26,7 @@ struct Holdings {
     int processes = 0;
     int threads = 0;
     int descriptors = 0;
-    int files = 0;            ///< below the state root
+    int files = 0;            ///< below the state root, but for the events, of which a few old files are kept
     long hostKilobytes = 0;   ///< of memory, of veltd
     long othersKilobytes = 0; ///< of all others
 };
