@@ -177,7 +177,8 @@ TEST_F(Changes, InGreatNumberLeaveNothingBehind) {
     Client root = asRoot();
     Holdings before;
     for (int i = 1; i <= count; ++i) {
-        ASSERT_EQ(setFtp(root, "\"timeout\":" + std::to_string(100 + i % 2)).status, 204) << i;
+        const Answer changed = setFtp(root, "\"timeout\":" + std::to_string(100 + i % 2));
+        ASSERT_EQ(changed.status, 204) << i << " " << changed.body;
         if (i == settled) {
             before = holdings();
         } else if (i % 100 == 0) {
