@@ -6,6 +6,7 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <string>
 
 namespace velt {
@@ -64,6 +65,12 @@ TEST_F(BanList, WhatHasEndedLeavesTheFile) {
     add(ban("192.0.2.1", 60));
     add(ban("192.0.2.2", 120), 60);
     EXPECT_EQ(root_.read("run/velt/bans"), "192.0.2.2 1800000120 ftp 10\n");
+}
+
+TEST_F(BanList, IsNobodyElsesBusiness) {
+    add(ban("192.0.2.1", 60));
+    EXPECT_EQ(std::filesystem::status(root_.path() / "run/velt/bans").permissions(),
+              std::filesystem::perms(0600));
 }
 
 TEST_F(BanList, ABanIsTakenOut) {

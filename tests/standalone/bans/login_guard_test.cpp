@@ -84,6 +84,14 @@ TEST_F(LoginGuard, SparesLoopbackAndWhomTheSettingsName) {
     EXPECT_TRUE(logged().empty());
 }
 
+TEST_F(LoginGuard, LetsLoopbackInWhateverTheListSays) {
+    root_.write("run/velt/bans", "127.0.0.1 4000000000 ftp 10\n::1 4000000000 ftp 10\n"
+                                 "192.0.2.8 4000000000 ftp 10\n");
+    EXPECT_TRUE(currentBanOf("192.0.2.8"));
+    EXPECT_FALSE(currentBanOf("127.0.0.1"));
+    EXPECT_FALSE(currentBanOf("::1"));
+}
+
 TEST_F(LoginGuard, LetsEverybodyTryWhereItIsOff) {
     set("enabled = 0\nfailures = 1");
     fail("192.0.2.3", 10);
@@ -113,6 +121,10 @@ TEST_F(LoginGuard, LiftsABanOnBehalfOfAnAdministrator) {
     EXPECT_EQ(banned(), "");
     ASSERT_EQ(logged().size(), 4U);
     EXPECT_EQ(logged()[0], "anna: The ban of 2001:db8:5::/64 was lifted.");
+    const std::string events = root_.read("var/log/velt/events.jsonl");
+    const std::size_t lifted = events.find(R"("ACTION":"lifted")");
+    ASSERT_NE(lifted, std::string::npos) << events;
+    EXPECT_NE(events.find(R"("ADDRESS":"192.0.2.5")", lifted), std::string::npos) << events;
 }
 
 TEST_F(LoginGuard, HandsTheFirewallWhatIsLeftOfEachBan) {
