@@ -54,6 +54,7 @@ Result<> changeSftpSettings(const std::function<void(SftpSettings&)>& change) {
 }
 
 Result<> changeExternalAddress(const std::string& address) {
+    VELT_RETURN_IF_ERROR(checkExternalAddress(address));
     const auto change = [&](FtpSettings& settings) { settings.externalAddress = address; };
     return changeStored<FtpSettings>(loadFtpFile, change, storeExternalAddress);
 }

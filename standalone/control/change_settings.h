@@ -16,7 +16,7 @@ namespace velt {
 Result<> changeFtpSettings(const std::function<void(FtpSettings&)>& change);
 Result<> changeSftpSettings(const std::function<void(SftpSettings&)>& change);
 
-/// Stores the external address in the same way.
+/// Stores the external address in the same way; one that checkExternalAddress refuses is none.
 Result<> changeExternalAddress(const std::string& address);
 
 } // namespace velt

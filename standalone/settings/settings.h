@@ -71,6 +71,11 @@ Result<NetworkSettings> loadNetworkSettings();
 Result<> checkFtpSettings(const FtpSettings& settings);
 Result<> checkSftpSettings(const SftpSettings& settings);
 
+/// Whether clients could ever reach this server at the address, an IPv4 one or "" for none: not at a
+/// loopback, link-local, multicast or broadcast one, nor at 0.x.x.x. For new addresses only: a service runs
+/// with the one that is stored.
+Result<> checkExternalAddress(const std::string& address);
+
 } // namespace velt
 
 #endif

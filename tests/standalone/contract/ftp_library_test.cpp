@@ -179,8 +179,8 @@ TEST_F(FtpContract, TheExternalAddressIsCheckedAndSharesItsFile) {
     root_.write("etc/veltinfo.conf", "# of this server\nunique=\"x\"\nftp_ext_ip=\nother = 1\n");
     ASSERT_GE(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
     EXPECT_EQ(externalAddress(), "203.0.113.7");
-    for (const char* bad :
-         {"eth0", "1.2.3.4\nx=1", "999.1.1.1", "%{env:HOME}", "1.2.3.4 ", "-1.2.3.4", "\xff"})
+    for (const char* bad : {"eth0", "1.2.3.4\nx=1", "999.1.1.1", "%{env:HOME}", "1.2.3.4 ", "-1.2.3.4",
+                            "\xff", "127.0.0.1", "224.0.0.1"})
         EXPECT_LT(VLIBCINFOSetKeyValue("ftp_ext_ip", bad), 0) << bad;
     EXPECT_EQ(root_.read("etc/veltinfo.conf"),
               "# of this server\nunique=\"x\"\nftp_ext_ip=203.0.113.7\nother = 1\n");

@@ -139,6 +139,26 @@ TEST(CheckFtp, LimitsBelowOneMeanNoLimit) {
                   "");
 }
 
+TEST(CheckExternalAddress, RefusesWhatNoClientCanReach) {
+    for (const char* text : {"0.0.0.0", "0.1.2.3", "127.0.0.1", "127.255.0.1", "169.254.1.1", "224.0.0.1",
+                             "239.255.255.255", "240.0.0.1", "255.255.255.255"}) {
+        const Result<> checked = checkExternalAddress(text);
+        ASSERT_FALSE(checked) << text;
+        EXPECT_EQ(checked.error().message.find("The external address (ext_ip) is " + std::string(text)), 0U)
+            << checked.error().message;
+    }
+    EXPECT_EQ(checkExternalAddress("127.0.0.1").error().message,
+              "The external address (ext_ip) is 127.0.0.1, a loopback address; expected the address at which "
+              "clients reach this server.");
+}
+
+TEST(CheckExternalAddress, TakesNoneAndAnyOther) {
+    for (const char* text : {"", "1.0.0.1", "10.0.0.1", "126.255.255.255", "128.0.0.1", "169.253.255.255",
+                             "169.255.0.1", "192.168.1.1", "203.0.113.7", "223.255.255.255"}) {
+        EXPECT_TRUE(checkExternalAddress(text)) << text;
+    }
+}
+
 TEST(CheckFtp, TheExternalAddressIsIPv4OrEmpty) {
     EXPECT_EQ(problemAfter(address("")), "");
     EXPECT_EQ(problemAfter(address("203.0.113.7")), "");
