@@ -1,6 +1,7 @@
 #include "standalone/control/service_firewall.h"
 
 #include "standalone/bans/login_guard.h"
+#include "standalone/control/administration_ports.h"
 #include "standalone/core/effects.h"
 #include "standalone/daemons/daemon.h"
 #include "standalone/firewall/firewall_table.h"
@@ -24,6 +25,7 @@ Result<FirewallNeeds> firewallNeeds() {
         }
     }
     needs.banned = sourcesToRefuse();
+    needs.administration = administrationPorts;
     return needs;
 }
 

@@ -49,6 +49,7 @@ Result<FirewallSettings> loadFirewallSettings() {
     FirewallSettings settings;
     settings.mode = readMode(file, settings.mode);
     settings.furtherPorts = readPorts(file);
+    settings.force = file.number("force", 0, 1, 0, optionalKey) == 1;
     VELT_RETURN_IF_ERROR(file.finish());
     return settings;
 }

@@ -18,6 +18,7 @@ enum class FirewallMode {
 struct FirewallSettings {
     FirewallMode mode = FirewallMode::accept;
     std::vector<VELT_FTP_PORT_RANGE> furtherPorts; ///< open in mode drop
+    bool force = false; ///< in mode drop, the ports by which the server is administered may be closed
 };
 
 /// The settings of the file
@@ -25,6 +26,7 @@ struct FirewallSettings {
 ///     version = 1
 ///     mode = drop
 ///     ports = 22 443 8000-8010
+///     force = 0
 ///
 /// or the defaults without a file. The table belongs to the machine: an installation below a root other than
 /// "/" touches it only when that root has a file of its own, and takes its rules away again by the mode off,

@@ -1,6 +1,7 @@
 #include "standalone/firewall/firewall_table.h"
 
 #include "base/file.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
@@ -15,6 +16,7 @@
 #include <syslog.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -58,22 +60,59 @@ Result<> removeRules(const std::string& script) {
     return {};
 }
 
+bool covers(const std::vector<VELT_FTP_PORT_RANGE>& ranges, int port) {
+    return std::ranges::any_of(ranges, [port](const VELT_FTP_PORT_RANGE& range) {
+        return port >= range.first && port <= range.last;
+    });
+}
+
+Result<> checkAdministration(const FirewallSettings& firewall, const FirewallNeeds& needs) {
+    if (firewall.mode != FirewallMode::drop || firewall.force || !needs.administration) {
+        return {};
+    }
+    VELT_ASSIGN_OR_RETURN(const auto ports, needs.administration());
+    const auto closed = firstClosed(ports, firewall, needs.openPorts);
+    if (!closed) {
+        return {};
+    }
+    const std::string port = std::to_string(closed->port);
+    return Error(ErrorNumber::firewall, "The firewall rules are not loaded: they would close port " + port +
+                                            ", by which " + closed->program + " is reached. Add " + port +
+                                            " to \"ports\" in " +
+                                            statePath(paths::firewallSettings).string() +
+                                            ", or, if you want it closed, a line \"force = 1\".");
+}
+
 // Each start of a service comes here, and most change no port.
-Result<> replaceRules(const std::string& script, const std::vector<BannedSource>& banned) {
+Result<> replaceRules(const FirewallSettings& firewall, const std::string& script,
+                      const FirewallNeeds& needs) {
     if (rulesAreInForce(script)) {
         return {};
     }
+    VELT_RETURN_IF_ERROR(checkAdministration(firewall, needs));
     // Noted before it is done, since a note without rules does no harm.
     VELT_RETURN_IF_ERROR(noteLoading());
     const auto before = rulesetGeneration();
     // Those who are banned are no part of what is compared: they come and go with the rules in force.
-    VELT_RETURN_IF_ERROR(runRuleScript(script + renderBannedSources(banned)));
+    VELT_RETURN_IF_ERROR(runRuleScript(script + renderBannedSources(needs.banned)));
     noteLoaded(script, before);
     warnOfForeignTables();
     return {};
 }
 
 } // namespace
+
+std::optional<AdministrationPort> firstClosed(const std::vector<AdministrationPort>& ports,
+                                              const FirewallSettings& firewall,
+                                              const std::vector<VELT_FTP_PORT_RANGE>& openPorts) {
+    if (firewall.mode != FirewallMode::drop) {
+        return std::nullopt;
+    }
+    const auto closed = std::ranges::find_if(ports, [&](const AdministrationPort& each) {
+        return !covers(openPorts, each.port) && !covers(firewall.furtherPorts, each.port);
+    });
+    return closed == ports.end() ? std::nullopt : std::optional(*closed);
+}
 
 Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds) {
     if (!mayTouchRules()) {
@@ -89,7 +128,7 @@ Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeed
     }
     VELT_ASSIGN_OR_RETURN(const auto needs, askNeeds());
     const std::string script = renderRuleset(firewall, needs.openPorts, needs.loginPorts);
-    return off ? removeRules(script) : replaceRules(script, needs.banned);
+    return off ? removeRules(script) : replaceRules(firewall, script, needs);
 }
 
 } // namespace velt

@@ -24,6 +24,18 @@ namespace {
 
 constexpr std::string_view listenState = "0A";
 
+/// Whether the address, as the kernel's tables have it, is 127.x.x.x or ::1. The bytes of each group of four
+/// stand in the machine's order.
+bool isLoopback(std::string_view address) {
+    constexpr std::size_t ipv4Length = 8;
+    constexpr std::string_view ipv6 = "00000000000000000000000001000000";
+    constexpr std::string_view mapped = "0000000000000000FFFF0000";
+    if (address.size() > ipv4Length && address.starts_with(mapped)) {
+        address.remove_prefix(mapped.size());
+    }
+    return address == ipv6 || (address.size() == ipv4Length && address.ends_with("7F"));
+}
+
 // A kernel without IPv6 has no table of it.
 Result<> addSockets(const std::string& table, std::vector<ListeningSocket>& sockets) {
     VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(table));
@@ -50,6 +62,7 @@ Result<> addSockets(const std::string& table, std::vector<ListeningSocket>& sock
             continue;
         }
         std::from_chars(local.data() + colon + 1, local.data() + local.size(), socket.port, 16);
+        socket.ofLoopback = isLoopback(std::string_view(local).substr(0, colon));
         sockets.push_back(socket);
     }
     return {};
@@ -130,6 +143,10 @@ Result<std::vector<ListeningSocket>> listeningSockets(pid_t pid) {
             return *std::move(diagnosed);
         }
     }
+    return readListeningSockets(pid);
+}
+
+Result<std::vector<ListeningSocket>> readListeningSockets(pid_t pid) {
     // "/proc/net" is the calling process's own; a thread could live in another namespace than its process.
     const std::string folder = pid == 0 ? "/proc/thread-self/net" : "/proc/" + std::to_string(pid) + "/net";
     std::vector<ListeningSocket> sockets;

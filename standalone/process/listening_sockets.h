@@ -15,12 +15,16 @@ namespace velt {
 struct ListeningSocket {
     int port = 0;
     unsigned long inode = 0;
-    uid_t user = 0; ///< who opened it
+    uid_t user = 0;          ///< who opened it
+    bool ofLoopback = false; ///< nobody else's machine can reach it
 };
 
 /// The listening TCP sockets, IPv4 and IPv6, of the network namespace in which the process `pid` lives; 0 is
 /// the caller.
 Result<std::vector<ListeningSocket>> listeningSockets(pid_t pid = 0);
+
+/// The same from the kernel's tables of all sockets, for one that answers no such question; takes longer.
+Result<std::vector<ListeningSocket>> readListeningSockets(pid_t pid = 0);
 
 /// Whether the process itself holds a listening socket on the port. If its sockets cannot be seen:
 /// whether its user has such a socket. False when that cannot be told.

@@ -42,6 +42,19 @@ template<class Value> std::optional<Value> valueIn(std::string_view text) {
     return value;
 }
 
+/// Whether it listens on 127.x.x.x, also as an IPv6 address, or on ::1.
+bool isLoopback(const inet_diag_msg& message) {
+    constexpr unsigned char loopback = 127;
+    std::array<unsigned char, sizeof(in6_addr)> bytes{};
+    std::memcpy(bytes.data(), message.id.idiag_src, bytes.size());
+    if (message.idiag_family == AF_INET) {
+        return bytes[0] == loopback;
+    }
+    in6_addr address{};
+    std::memcpy(&address, bytes.data(), sizeof address);
+    return IN6_IS_ADDR_LOOPBACK(&address) || (IN6_IS_ADDR_V4MAPPED(&address) && bytes[12] == loopback);
+}
+
 enum class Reading {
     goesOn,
     ended,
@@ -58,7 +71,8 @@ Reading take(std::string_view packet, std::vector<ListeningSocket>& sockets) {
         if (head->nlmsg_type != SOCK_DIAG_BY_FAMILY || !message || head->nlmsg_len < NLMSG_HDRLEN) {
             return Reading::failed;
         }
-        sockets.push_back({ntohs(message->id.idiag_sport), message->idiag_inode, message->idiag_uid});
+        sockets.push_back(
+            {ntohs(message->id.idiag_sport), message->idiag_inode, message->idiag_uid, isLoopback(*message)});
         packet.remove_prefix(std::min<std::size_t>(packet.size(), NLMSG_ALIGN(head->nlmsg_len)));
     }
     return Reading::goesOn;

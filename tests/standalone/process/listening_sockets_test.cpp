@@ -8,6 +8,7 @@
 #include "tests/support/ports.h"
 #include "tests/support/result.h"
 
+#include <arpa/inet.h>
 #include <netinet/in.h>
 #include <sched.h>
 #include <sys/prctl.h>
@@ -15,7 +16,10 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
+#include <optional>
+#include <string_view>
 
 namespace velt::test {
 namespace {
@@ -42,6 +46,48 @@ TEST(ListeningSockets, AreFoundForIPv4AndIPv6) {
     ASSERT_EQ(::listen(six, 1), 0);
     EXPECT_TRUE(listensOn(::getpid(), port));
     ::close(six);
+}
+
+/// Whether the socket that listens on the port can be reached from loopback alone, as both ways of asking
+/// tell; nothing when they disagree.
+std::optional<bool> isOfLoopback(int port) {
+    const auto of = [port](const std::vector<ListeningSocket>& sockets) -> std::optional<bool> {
+        const auto found = std::ranges::find(sockets, port, &ListeningSocket::port);
+        return found == sockets.end() ? std::nullopt : std::optional(found->ofLoopback);
+    };
+    const auto asked = of(listeningSockets().valueOr({}));
+    const auto read = of(readListeningSockets().valueOr({}));
+    return asked == read ? asked : std::nullopt;
+}
+
+TEST(ListeningSockets, OfLoopbackAreToldApart) {
+    const struct {
+        const char* address;
+        bool loopback;
+    } cases[]{{"127.0.0.1", true}, {"127.9.9.9", true},        {"0.0.0.0", false},
+              {"::1", true},       {"::ffff:127.0.0.1", true}, {"::", false}};
+    for (const auto& each : cases) {
+        const bool four = std::string_view(each.address).find(':') == std::string_view::npos;
+        const int descriptor = ::socket(four ? AF_INET : AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0);
+        const int port = freePort();
+        sockaddr_in6 six{};
+        six.sin6_family = AF_INET6;
+        six.sin6_port = htons(static_cast<in_port_t>(port));
+        ::inet_pton(AF_INET6, each.address, &six.sin6_addr);
+        sockaddr_in address{};
+        address.sin_family = AF_INET;
+        address.sin_port = htons(static_cast<in_port_t>(port));
+        ::inet_pton(AF_INET, each.address, &address.sin_addr);
+        const auto* const name =
+            four ? reinterpret_cast<const sockaddr*>(&address) : reinterpret_cast<const sockaddr*>(&six);
+        if (::bind(descriptor, name, four ? sizeof address : sizeof six) == 0) {
+            ASSERT_EQ(::listen(descriptor, 1), 0);
+            EXPECT_EQ(isOfLoopback(port), each.loopback) << each.address;
+        } else {
+            EXPECT_FALSE(four) << "only a machine without IPv6 has no such address: " << each.address;
+        }
+        ::close(descriptor);
+    }
 }
 
 // Starts a process that listens and hides it, as daemons do that have changed their rights, and asks as the
