@@ -18,6 +18,9 @@
 #include "standalone/contract/last_port_conflict.h"
 #include "standalone/control/service_overview.h"
 
+// What is wrong, and what mends it.
+#include "standalone/health/judge_health.h"
+
 // On whose behalf, what happened, and what was written down.
 #include "standalone/journal/admin_log.h"
 #include "standalone/journal/request_actor.h"

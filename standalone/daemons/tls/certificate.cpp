@@ -129,20 +129,41 @@ Result<ServerCertificate> throwAway() {
     return certificate;
 }
 
+Pair givenPair() {
+    return {statePath(paths::givenCertificate), statePath(paths::givenKey)};
+}
+
+Pair ownPair() {
+    return {statePath(paths::ownCertificate), statePath(paths::ownKey)};
+}
+
+bool isThere(const Pair& pair) {
+    return fileExists(pair.certificate) || fileExists(pair.key);
+}
+
 } // namespace
 
 Result<ServerCertificate> serverCertificate() {
-    const Pair given{statePath(paths::givenCertificate), statePath(paths::givenKey)};
-    if (fileExists(given.certificate) || fileExists(given.key)) {
+    if (const Pair given = givenPair(); isThere(given)) {
         return loadGiven(given);
     }
-    const Pair own{statePath(paths::ownCertificate), statePath(paths::ownKey)};
+    const Pair own = ownPair();
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     if (isUsable(own)) {
         return load(own);
     }
     VELT_RETURN_IF_ERROR(perform(Effect::store, "certificate", [&] { return makeOwn(own); }));
     return isUsable(own) ? load(own) : throwAway();
+}
+
+Result<std::optional<ServerCertificate>> storedCertificate() {
+    const Pair given = givenPair();
+    const Pair own = ownPair();
+    if (!isThere(given) && !isThere(own)) {
+        return std::optional<ServerCertificate>();
+    }
+    VELT_ASSIGN_OR_RETURN(auto certificate, isThere(given) ? loadGiven(given) : load(own));
+    return std::optional(std::move(certificate));
 }
 
 } // namespace velt

@@ -6,6 +6,7 @@
 
 #include <filesystem>
 #include <memory>
+#include <optional>
 #include <string>
 
 namespace velt {
@@ -28,6 +29,10 @@ struct ServerCertificate {
 /// elliptic curve, or others than the owner (root or this process's user) and the group may read the given
 /// key, or others than the owner may write it. Thread-safe.
 Result<ServerCertificate> serverCertificate();
+
+/// The certificate that is stored, read and checked in the same way, and nothing made. Nothing when none was
+/// given or made. Thread-safe.
+Result<std::optional<ServerCertificate>> storedCertificate();
 
 } // namespace velt
 

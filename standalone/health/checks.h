@@ -1,0 +1,46 @@
+// The checks that make up the judgement, each for itself. All are thread-safe.
+#ifndef VELT_STANDALONE_HEALTH_CHECKS_H
+#define VELT_STANDALONE_HEALTH_CHECKS_H
+
+#include "standalone/health/finding.h"
+
+#include <chrono>
+
+namespace velt {
+
+using TimePoint = std::chrono::system_clock::time_point;
+
+/// Enabled services that are down or run with former settings, with the reason.
+Findings serviceFindings();
+
+/// Services that run, and do not greet or take up TLS as their clients expect, or serve a certificate other
+/// than the stored one.
+Findings greetingFindings();
+
+/// Daemons and supervisors of ours, and this program, that run from files which have been replaced since.
+Findings replacedProgramFindings();
+
+/// The certificate of FTPS: whether it fits its key, and when it is valid. Nothing while FTPS is off.
+Findings certificateFindings(TimePoint now);
+
+/// The files of the shares and of the chroot rules, and the accounts that they name.
+Findings fileFindings();
+
+/// Whether the packet filter has the rules that the settings ask for, and whether they are of use.
+Findings firewallFindings();
+
+/// Who listens in the passive range, and whether it is too small beside the kernel's own.
+Findings passiveRangeFindings();
+
+/// Whether the stored external address can be reached by anybody.
+Findings externalAddressFindings();
+
+/// The room that is left below the state root.
+Findings diskFindings();
+
+/// A clock that is behind the files of this system.
+Findings clockFindings(TimePoint now);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,144 @@
+#include "standalone/control/service_firewall.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/state_root.h"
+#include "standalone/firewall/firewall_settings.h"
+#include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/rule_script.h"
+#include "standalone/firewall/ruleset.h"
+#include "standalone/firewall/ruleset_generation.h"
+#include "standalone/firewall/table_reading.h"
+#include "standalone/health/checks.h"
+#include "standalone/ports/port_range.h"
+#include "standalone/process/run_program.h"
+
+#include <algorithm>
+#include <mutex>
+
+namespace velt {
+namespace {
+
+constexpr std::chrono::seconds nftLimit{3};
+constexpr const char* reload = "systemctl restart veltd";
+
+Finding finding(const char* id, Severity severity, std::string sentence, std::string mend) {
+    return {id, severity, "firewall", std::move(sentence), std::move(mend)};
+}
+
+std::string afterEdit(const std::string& edit) {
+    return edit + " in " + statePath(paths::firewallSettings).string() + ", then run: " + reload;
+}
+
+bool sameRanges(const std::vector<VELT_FTP_PORT_RANGE>& some,
+                const std::vector<VELT_FTP_PORT_RANGE>& others) {
+    return std::ranges::equal(some, others, [](const auto& one, const auto& other) {
+        return one.first == other.first && one.last == other.last;
+    });
+}
+
+/// Whether the table does what the settings and the services need.
+Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& needs) {
+    const bool drops = settings.mode == FirewallMode::drop;
+    const auto listed = runProcess({"nft", "--json", "list", "table", "inet", "velt_fileserv"}, {}, nftLimit);
+    const auto table = listed && listed->exitCode == 0 ? readTable(listed->output) : std::nullopt;
+    if (!table) {
+        return {finding("firewall-rules-missing", drops ? Severity::error : Severity::warning,
+                        std::string("The firewall rules of this system are not in force: ") +
+                            (drops ? "all ports of this server are open that others do not close."
+                                   : "nobody is refused after failed logins."),
+                        reload)};
+    }
+    std::vector<VELT_FTP_PORT_RANGE> wanted = needs.openPorts;
+    if (drops) {
+        wanted.insert(wanted.end(), settings.furtherPorts.begin(), settings.furtherPorts.end());
+    }
+    wanted = joinedRanges(std::move(wanted));
+    if (table->drops == drops && sameRanges(table->openPorts, wanted)) {
+        return {};
+    }
+    std::string ports;
+    for (const VELT_FTP_PORT_RANGE& range : wanted) {
+        ports += (ports.empty() ? "" : ", ") + formatPortRange(range);
+    }
+    return {
+        finding("firewall-rules-differ", drops || table->drops ? Severity::error : Severity::warning,
+                "The firewall rules in force are not those that the settings ask for, which open the ports " +
+                    (ports.empty() ? "of nobody" : ports) + ".",
+                reload)};
+}
+
+Findings foreignFindings() {
+    const auto listed = runProcess({"nft", "--json", "list", "chains"}, {}, nftLimit);
+    Findings findings;
+    for (const std::string& chain : foreignDropChains(listed ? listed->output : "")) {
+        findings.push_back(
+            finding("firewall-foreign-drop", Severity::warning,
+                    "The chain \"" + chain +
+                        "\" of another firewall drops what it does not accept itself, so ports of "
+                        "the file services may be closed.",
+                    "nft list chain " + chain));
+    }
+    return findings;
+}
+
+Findings lockOutFindings(const FirewallSettings& settings, const FirewallNeeds& needs) {
+    if (settings.mode != FirewallMode::drop || settings.force || !needs.administration) {
+        return {};
+    }
+    const auto ports = needs.administration();
+    const auto closed = ports ? firstClosed(*ports, settings, needs.openPorts) : std::nullopt;
+    if (!closed) {
+        return {};
+    }
+    const std::string port = std::to_string(closed->port);
+    return {finding("firewall-locks-out", Severity::error,
+                    "The firewall rules are not loaded, since they would close port " + port + ", by which " +
+                        closed->program + " is reached.",
+                    afterEdit("Add " + port + " to \"ports\""))};
+}
+
+/// What was found for these rules; the packet filter counts every change of them.
+struct Judged {
+    std::mutex mutex;
+    std::uint32_t generation = 0;
+    std::string script;
+    std::optional<Findings> findings;
+};
+
+Findings findingsInForce(const FirewallSettings& settings, const FirewallNeeds& needs,
+                         std::uint32_t generation) {
+    static Judged judged;
+    const std::string script = renderRuleset(settings, needs.openPorts, needs.loginPorts);
+    const std::lock_guard lock(judged.mutex);
+    if (!judged.findings || judged.generation != generation || judged.script != script) {
+        Findings findings = tableFindings(settings, needs);
+        std::ranges::move(foreignFindings(), std::back_inserter(findings));
+        judged.generation = generation;
+        judged.script = script;
+        judged.findings = std::move(findings);
+    }
+    return *judged.findings;
+}
+
+} // namespace
+
+Findings firewallFindings() {
+    if (!mayTouchRules()) {
+        return {};
+    }
+    const auto settings = loadFirewallSettings();
+    if (!settings) {
+        return {finding("firewall-settings-damaged", Severity::error,
+                        settings.error().message + " The firewall keeps its former rules.",
+                        "Correct the file, then run: " + std::string(reload))};
+    }
+    const auto generation = rulesetGeneration();
+    const auto needs = firewallNeeds();
+    if (settings->mode == FirewallMode::off || !needs || !generation) {
+        return {}; // nothing to be in force, services that tell what is wrong, or no right to look
+    }
+    Findings findings = lockOutFindings(*settings, *needs);
+    std::ranges::move(findingsInForce(*settings, *needs, *generation), std::back_inserter(findings));
+    return findings;
+}
+
+} // namespace velt

@@ -1,0 +1,46 @@
+#include "standalone/health/judge_health.h"
+
+#include "standalone/health/checks.h"
+
+#include <algorithm>
+#include <array>
+#include <exception>
+#include <iterator>
+
+namespace velt {
+namespace {
+
+Finding failedCheck(const std::exception& error) {
+    return {"check-failed", Severity::warning, "host", std::string("A check failed: ") + error.what() + ".",
+            "veltctl doctor"};
+}
+
+} // namespace
+
+Findings judgeHealth() {
+    using Check = Findings (*)();
+    static constexpr std::array checks{
+        Check{serviceFindings},
+        Check{greetingFindings},
+        Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},
+        Check{fileFindings},
+        Check{firewallFindings},
+        Check{passiveRangeFindings},
+        Check{externalAddressFindings},
+        Check{replacedProgramFindings},
+        Check{diskFindings},
+        Check{[] { return clockFindings(std::chrono::system_clock::now()); }},
+    };
+    Findings all;
+    for (const Check check : checks) {
+        try {
+            std::ranges::move(check(), std::back_inserter(all));
+        } catch (const std::exception& error) {
+            all.push_back(failedCheck(error)); // the others still tell what they find
+        }
+    }
+    std::ranges::stable_sort(all, std::ranges::greater(), &Finding::severity);
+    return all;
+}
+
+} // namespace velt
