@@ -70,10 +70,17 @@ void App::addRoutes(const ModuleTable& table) {
     add(statusRoutes(table));
     add(banRoutes(log_));
     add(tokenRoutes(tokens_, log_));
-    add({logRoute(), metricsRoute(metrics_, table, events_), openApiRoute(openApi_), eventRoute()});
+    add(healthRoutes(health_));
+    add({logRoute(), metricsRoute(metrics_, table, events_, health_), openApiRoute(openApi_), eventRoute()});
 }
 
 std::optional<Refusal> App::checkAccess(const HttpRequest& head, const Peer& peer, Principal& principal) {
+    if (head.authorization.empty()) {
+        // Answered like a refusal, which makes nothing of who asks: the connection stays that of a stranger.
+        if (auto answer = probeAnswer(head, health_)) {
+            return Refusal{std::move(*answer), false};
+        }
+    }
     auto refusal = access_.check(head, peer, principal);
     if (refusal) {
         metrics_.countRefusal(refusal->response.status);

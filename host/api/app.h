@@ -4,6 +4,7 @@
 
 #include "host/api/access_control.h"
 #include "host/api/events.h"
+#include "host/api/health.h"
 #include "host/api/metrics.h"
 #include "host/api/openapi.h"
 #include "host/api/route.h"
@@ -67,6 +68,7 @@ private:
     AccessControl access_;
     OpenApi openApi_;
     Metrics metrics_;
+    HealthMonitor health_;
     EventHub events_;
     PlatformEvents platformEvents_;
     Rows rows_;

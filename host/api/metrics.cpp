@@ -54,9 +54,11 @@ struct Metrics::Families {
     Gauges up = gauge("velt_service_up", "Whether a service runs");
     Counters starts = counter("velt_daemon_starts_total", "Service starts that requests asked for");
     Counters restarts = counter("velt_daemon_restarts_total", "Restarts of a daemon that ended by itself");
+    Gauges findings = gauge("velt_health_findings", "What /api/health finds wrong");
     prometheus::Gauge& eventReaders = gauge("velt_event_readers", "Open streams of events").Add({});
     std::mutex mutex;
     std::map<std::string, std::uint64_t> seenRestarts;
+    std::map<std::map<std::string, std::string>, double> seenFindings; ///< by their labels
 };
 
 Metrics::Metrics() : families_(std::make_unique<Families>()) {}
@@ -95,11 +97,24 @@ void Metrics::setEventReaders(std::size_t count) {
     families_->eventReaders.Set(static_cast<double>(count));
 }
 
+void Metrics::setFindings(const Findings& findings) {
+    const std::lock_guard lock(families_->mutex);
+    for (auto& [labels, count] : families_->seenFindings) {
+        count = 0;
+    }
+    for (const Finding& each : findings) {
+        ++families_->seenFindings[{{"id", each.id}, {"severity", std::string(severityName(each.severity))}}];
+    }
+    for (const auto& [labels, count] : families_->seenFindings) {
+        families_->findings.Add(labels).Set(count);
+    }
+}
+
 std::string Metrics::text() const {
     return prometheus::TextSerializer().Serialize(families_->registry.Collect());
 }
 
-Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events) {
+Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events, HealthMonitor& health) {
     return {"GET", {"metrics"}, false, RequestOrder::Kind::read, [&](const Call& call) {
                 for (const Service& each : listServices(table, call.principal)) {
                     metrics.setService(each.name, each.wanted.value_or(true), each.running);
@@ -108,6 +123,9 @@ Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events)
                     metrics.setDaemonRestarts(daemon, count);
                 }
                 metrics.setEventReaders(events.readers());
+                if (const auto judgement = health.latest()) {
+                    metrics.setFindings(*judgement);
+                }
                 return HttpResponse{200, "text/plain; version=0.0.4; charset=utf-8", metrics.text(), {}};
             }};
 }

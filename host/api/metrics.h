@@ -1,8 +1,9 @@
-// /metrics: requests and their durations by row and outcome, services up, daemon starts and restarts.
+// /metrics: requests and their durations by row and outcome, services up, daemon starts and restarts, health.
 #ifndef VELT_HOST_API_METRICS_H
 #define VELT_HOST_API_METRICS_H
 
 #include "host/api/events.h"
+#include "host/api/health.h"
 #include "host/api/route.h"
 #include "host/module/module_call.h"
 
@@ -38,6 +39,9 @@ public:
 
     void setEventReaders(std::size_t count);
 
+    /// Counts what was found by identifier and severity; what is not found any more has a count of 0.
+    void setFindings(const Findings& findings);
+
     /// The text format of Prometheus.
     std::string text() const;
 
@@ -48,7 +52,7 @@ private:
 };
 
 /// All of these outlive the route.
-Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events);
+Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events, HealthMonitor& health);
 
 } // namespace velt::host
 

@@ -21,16 +21,6 @@ HttpResponse status(const ModuleTable& table, Clock::time_point start, const Cal
                                     {"services", jsonArray(listServices(table, call.principal), describe)}}));
 }
 
-HttpResponse health() {
-    Json::Value value(Json::objectValue);
-    const std::vector<ServiceDown> down = servicesDown();
-    value["status"] = down.empty() ? "ok" : "degraded";
-    for (const ServiceDown& each : down) {
-        value["down"].append(toObject(each));
-    }
-    return jsonResponse(200, value);
-}
-
 } // namespace
 
 std::vector<Route> statusRoutes(const ModuleTable& table) {
@@ -41,8 +31,6 @@ std::vector<Route> statusRoutes(const ModuleTable& table) {
          false,
          Kind::read,
          [&table, start = Clock::now()](const Call& call) { return status(table, start, call); }},
-        // Unordered: a long change must not make the host look hung.
-        {"GET", {"healthz"}, false, Kind::unordered, [](const Call&) { return health(); }},
     };
 }
 

@@ -1,4 +1,4 @@
-// /api/status and /healthz: the state of the host and its services.
+// /api/status: the state of the host and its services.
 #ifndef VELT_HOST_API_STATUS_H
 #define VELT_HOST_API_STATUS_H
 

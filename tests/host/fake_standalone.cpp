@@ -3,6 +3,7 @@
 #include "tests/support/fake_platform/fake_platform.h"
 
 #include <algorithm>
+#include <array>
 #include <mutex>
 #include <set>
 #include <utility>
@@ -115,6 +116,21 @@ std::vector<StoredService> storedServices() {
 
 std::map<std::string, std::uint64_t> daemonRestarts() {
     return FakeStandalone::instance().restarts;
+}
+
+Findings judgeHealth() {
+    FakeStandalone& fake = FakeStandalone::instance();
+    if (fake.whileJudged) {
+        fake.whileJudged();
+    }
+    const std::lock_guard lock(mutex);
+    ++fake.judgements;
+    return fake.findings;
+}
+
+std::string_view severityName(Severity severity) {
+    constexpr std::array<std::string_view, 3> names{"notice", "warning", "error"};
+    return names.at(static_cast<std::size_t>(severity));
 }
 
 void clearLastError() {

@@ -24,6 +24,9 @@ struct FakeStandalone {
     bool startHelps = false;             ///< and run once they are started
     int starts = 0;                      ///< how often the host started what is switched on
     std::map<std::string, std::uint64_t> restarts;
+    velt::Findings findings;           ///< of the judgements to come
+    int judgements = 0;                ///< how many were made
+    std::function<void()> whileJudged; ///< called by each
     std::vector<velt::Ban> bans;
     bool bansFail = false;                 ///< with `sentence`
     std::vector<std::string> failedLogins; ///< "SERVICE ADDRESS"

@@ -17,13 +17,13 @@ namespace {
 const std::string sftp = "/api/VELT.Core.FileServ.FTP.SFTP/v1/";
 const std::vector<std::string> everyPath{"/",
                                          "/api",
+                                         "/api/health",
                                          "/api/status",
                                          "/api/log",
                                          "/api/bans",
                                          "/api/bans/192.0.2.1",
                                          "/api/tokens",
                                          "/api/tokens/1",
-                                         "/healthz",
                                          "/metrics",
                                          "/openapi.json",
                                          "/events",
@@ -86,19 +86,19 @@ TEST_F(HostAccess, ARequestThatIsWrongInItselfIs401WithoutAToken) {
              "OPTIONS * HTTP/1.1\r\n" + host + "\r\n",
              "TRACE /api HTTP/1.1\r\n" + host + "\r\n",
              "HEAD /api HTTP/1.1\r\n" + host + "\r\n",
-             "GET http://localhost/healthz HTTP/1.1\r\n" + host + "\r\n",
+             "GET http://localhost/api/status HTTP/1.1\r\n" + host + "\r\n",
              "GET /%zz HTTP/1.1\r\n" + host + "\r\n",
              "GET /../../etc/passwd HTTP/1.1\r\n" + host + "\r\n",
-             "GET /healthz HTTP/1.1\r\n\r\n",
-             "GET /healthz HTTP/1.1\r\n" + host + host + "\r\n",
-             "GET /healthz HTTP/1.1\r\nHost: evil.example\r\n\r\n",
-             "GET /healthz HTTP/1.1\r\nOrigin: http://evil.example\r\n" + host + "\r\n",
+             "GET /api/status HTTP/1.1\r\n\r\n",
+             "GET /api/status HTTP/1.1\r\n" + host + host + "\r\n",
+             "GET /api/status HTTP/1.1\r\nHost: evil.example\r\n\r\n",
+             "GET /api/status HTTP/1.1\r\nOrigin: http://evil.example\r\n" + host + "\r\n",
              "POST " + sftp + "set HTTP/1.1\r\nTransfer-Encoding: gzip\r\n" + host + "\r\n",
              "POST " + sftp + "set HTTP/1.1\r\nTransfer-Encoding: chunked\r\n" + host + "\r\nnone\r\n",
              "POST " + sftp + "set HTTP/1.1\r\nContent-Length: 99999999\r\nExpect: 100-continue\r\n" + host +
                  "\r\n",
              requestText("POST", sftp + "set", "Content-Type: text/plain\r\n", "{\"enable\":"),
-             "GET /healthz HTTP/1.0\r\n" + host + "\r\n",
+             "GET /api/status HTTP/1.0\r\n" + host + "\r\n",
          }) {
         Client client = connect();
         client.send(text);
@@ -111,7 +111,7 @@ TEST_F(HostAccess, ARequestThatIsWrongInItselfIs401WithoutAToken) {
 TEST_F(HostAccess, WhatFollowsARefusedRequestIsNotServed) {
     start();
     Client client = connect();
-    client.send(requestText("GET", "/healthz") +
+    client.send(requestText("GET", "/api/status") +
                 requestText("POST", sftp + "set", admin, R"({"enable":true})"));
     EXPECT_EQ(client.receive().status, 401);
     EXPECT_EQ(client.receive().status, 0);
@@ -121,8 +121,8 @@ TEST_F(HostAccess, WhatFollowsARefusedRequestIsNotServed) {
 TEST_F(HostAccess, EachRequestOfAConnectionShowsItsToken) {
     start();
     Client client = connect();
-    EXPECT_EQ(client.ask(requestText("GET", "/healthz", admin)).status, 200);
-    EXPECT_EQ(client.ask(requestText("GET", "/healthz")).status, 401);
+    EXPECT_EQ(client.ask(requestText("GET", "/api/status", admin)).status, 200);
+    EXPECT_EQ(client.ask(requestText("GET", "/api/status")).status, 401);
     EXPECT_TRUE(client.ended());
 }
 
@@ -141,7 +141,7 @@ TEST_F(HostAccess, WrongTokensAreRefusedAndLogged) {
 TEST_F(HostAccess, ManyRefusalsAreCountedAndNotWritten) {
     start();
     const auto refusals = [this](std::size_t count) {
-        const std::string text = requestText("GET", "/healthz");
+        const std::string text = requestText("GET", "/api/status");
         for (std::size_t i = 0; i < count; ++i) {
             Client client = connect();
             EXPECT_EQ(client.ask(i % 2 == 0 ? text : "NONSENSE\r\n\r\n").status, i % 2 == 0 ? 401 : 400);
@@ -191,7 +191,7 @@ TEST_F(HostAccess, ViewersRead) {
     start();
     for (const std::string& path :
          {sftp + "get", std::string("/api"), std::string("/api/status"), std::string("/api/log"),
-          std::string("/metrics"), std::string("/healthz")}) {
+          std::string("/metrics"), std::string("/api/status")}) {
         EXPECT_EQ(ask("GET", path, viewer).status, 200) << path;
     }
     const std::string list = "/api/VELT.Core.FileServ.FTP.ChrootUser/v1/list";
@@ -213,7 +213,7 @@ TEST_F(HostAccess, TheHostMustBeThisOne) {
     start();
     const auto askFor = [this](const std::string& host) {
         Client client = connect();
-        return client.ask("GET /healthz HTTP/1.1\r\nHost: " + host + "\r\n" + admin + "\r\n").status;
+        return client.ask("GET /api/status HTTP/1.1\r\nHost: " + host + "\r\n" + admin + "\r\n").status;
     };
     const std::string real = ":" + std::to_string(port);
     for (const std::string& host : {std::string("localhost"), "localhost" + real, "127.0.0.1" + real,
@@ -233,16 +233,16 @@ TEST_F(HostAccess, TheHostMustBeThisOne) {
 
 TEST_F(HostAccess, PagesOfAnotherOriginAreRefused) {
     start();
-    EXPECT_EQ(ask("GET", "/healthz", admin + "Origin: http://localhost\r\n").status, 200);
-    EXPECT_EQ(ask("GET", "/healthz", admin + "Sec-Fetch-Site: same-origin\r\n").status, 200);
-    EXPECT_EQ(ask("GET", "/healthz", admin + "Sec-Fetch-Site: none\r\n").status, 200);
+    EXPECT_EQ(ask("GET", "/api/status", admin + "Origin: http://localhost\r\n").status, 200);
+    EXPECT_EQ(ask("GET", "/api/status", admin + "Sec-Fetch-Site: same-origin\r\n").status, 200);
+    EXPECT_EQ(ask("GET", "/api/status", admin + "Sec-Fetch-Site: none\r\n").status, 200);
     for (const char* header : {"Origin: http://evil.example\r\n", "Origin: null\r\n",
                                "Origin: https://localhost\r\n", "Origin: http://localhost:1\r\n",
                                "Sec-Fetch-Site: cross-site\r\n", "Sec-Fetch-Site: same-site\r\n"}) {
-        EXPECT_EQ(ask("GET", "/healthz", admin + header).status, 403) << header;
+        EXPECT_EQ(ask("GET", "/api/status", admin + header).status, 403) << header;
     }
     Client local = Client::unixSocket(socketPath);
-    EXPECT_EQ(local.ask(requestText("GET", "/healthz", "Origin: http://evil.example\r\n")).status, 403);
+    EXPECT_EQ(local.ask(requestText("GET", "/api/status", "Origin: http://evil.example\r\n")).status, 403);
 }
 
 TEST_F(HostAccess, RootIsAdminOnTheUnixSocket) {
@@ -250,7 +250,7 @@ TEST_F(HostAccess, RootIsAdminOnTheUnixSocket) {
     Client client = Client::unixSocket(socketPath);
     EXPECT_EQ(client.ask(requestText("POST", sftp + "set", "", R"({"enable":true})")).status, 204);
     EXPECT_EQ(FakeStandalone::instance().address, "local");
-    EXPECT_EQ(client.ask(requestText("GET", "/healthz", "Authorization: Bearer wrong\r\n")).status, 401)
+    EXPECT_EQ(client.ask(requestText("GET", "/api/status", "Authorization: Bearer wrong\r\n")).status, 401)
         << "a token that is shown is looked at";
 }
 

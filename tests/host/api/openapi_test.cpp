@@ -117,6 +117,7 @@ protected:
         std::string method;
         std::string path;
         Json::Value responses;
+        bool isForEverybody = false; ///< who shows no token is answered, too
     };
 
     std::vector<Operation> operations() const {
@@ -126,7 +127,9 @@ protected:
                 std::string upper = method;
                 std::ranges::transform(upper, upper.begin(),
                                        [](unsigned char c) { return static_cast<char>(std::toupper(c)); });
-                all.push_back({upper, path, document["paths"][path][method]["responses"]});
+                const Json::Value& operation = document["paths"][path][method];
+                const bool isForEverybody = operation.isMember("security");
+                all.push_back({upper, path, operation["responses"], isForEverybody});
             }
         }
         return all;
@@ -198,7 +201,8 @@ TEST_F(OpenApiTest, EveryOtherPathIsServedAsDescribed) {
 TEST_F(OpenApiTest, EveryOperationTellsOfRefusalsThatComeBeforeIt) {
     const std::string manyBytes = "Content-Length: 2000000\r\n";
     for (const Operation& each : operations()) {
-        expectDescribed(each, ask(each.method, each.path).status, 401);
+        const std::string token = each.isForEverybody ? "Authorization: Bearer wrong\r\n" : "";
+        expectDescribed(each, ask(each.method, each.path, token).status, 401);
         expectDescribed(each, ask(each.method, each.path, admin + "Origin: http://elsewhere\r\n").status,
                         403);
         expectDescribed(each, ask(each.method, each.path, admin + manyBytes).status, 413);

@@ -79,15 +79,6 @@ TEST_F(HostServices, ReadsAndRefusalsStartNothing) {
     EXPECT_EQ(access.starts, 0);
 }
 
-TEST_F(HostServices, HealthNamesWhatIsDown) {
-    EXPECT_EQ(get("/healthz").body, R"({"status":"ok"})");
-    access.down = {ftpDown};
-    const Answer answer = get("/healthz");
-    EXPECT_EQ(answer.status, 200) << "the host itself is well";
-    EXPECT_EQ(answer.body, R"({"down":[{"reason":"The FTP daemon does not start: no luck.",)"
-                           R"("serves_former_settings":false,"service":"ftp"}],"status":"degraded"})");
-}
-
 TEST_F(HostServices, StatusAndMetricsTellWhatIsSwitchedOnButDown) {
     platform.services["ftpd"] = 1;
     platform.conf.service_flags = 1;
@@ -146,7 +137,6 @@ TEST_F(HostServices, StatusComesFromTheModulesAnswers) {
     EXPECT_EQ(status["services"][1]["enabled"], false);
     EXPECT_EQ(status["services"][2]["name"], "sftp");
     EXPECT_EQ(status["services"][2]["port"], 2022);
-    EXPECT_EQ(get("/healthz").json()["status"], "ok");
 }
 
 TEST_F(HostServices, StatusTellsWhatIsStoredBesideWhatRuns) {
