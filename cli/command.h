@@ -4,6 +4,7 @@
 
 #include "cli/api_client.h"
 #include "cli/console.h"
+#include "cli/failure.h"
 
 #include <functional>
 
@@ -16,7 +17,8 @@ namespace velt::cli {
 struct Context {
     Console& console;
     ApiClient& api;
-    bool json = false; ///< the output is for programs
+    bool json = false;                  ///< the output is for programs
+    ExitCode exitCode = ExitCode::done; ///< of a command that was carried out
 
     /// Writes the value as JSON when the output is for programs. False when it is for people: nothing is
     /// written.
@@ -34,6 +36,7 @@ void addSettingsCommands(CLI::App& app, Command& chosen);
 void addShareCommands(CLI::App& app, Command& chosen);
 void addChrootCommands(CLI::App& app, Command& chosen);
 void addStatusCommands(CLI::App& app, Command& chosen);
+void addDoctorCommand(CLI::App& app, Command& chosen);
 void addLogCommand(CLI::App& app, Command& chosen);
 void addBanCommands(CLI::App& app, Command& chosen);
 void addTokenCommands(CLI::App& app, Command& chosen);

@@ -14,7 +14,7 @@ namespace {
 
 constexpr const char* exitCodes =
     "Exit codes: 0 done, 1 local file, 2 usage, 3 input refused, 4 conflict, 5 the server failed, "
-    "6 no connection or no access.";
+    "6 no connection or no access, 8 the server is not well.";
 
 void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
     app.add_flag("--json", options.json, "Write JSON, for programs");
@@ -55,7 +55,7 @@ ExitCode endOfParsing(const CLI::App& app, const CLI::ParseError& error, Console
     return ExitCode::usage;
 }
 
-void runCommand(const Command& command, const GlobalOptions& options, Console& console) {
+ExitCode runCommand(const Command& command, const GlobalOptions& options, Console& console) {
     ApiClient api(findServer(options.server, console));
     Context context{console, api, options.json};
     try {
@@ -68,6 +68,7 @@ void runCommand(const Command& command, const GlobalOptions& options, Console& c
         throw Failure(ExitCode::local, "Cannot write the output.",
                       "Check that the output is writable and has free space.");
     }
+    return context.exitCode;
 }
 
 } // namespace
@@ -79,6 +80,7 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     app.footer(exitCodes);
     addGlobalOptions(app, options);
     addStatusCommands(app, chosen);
+    addDoctorCommand(app, chosen);
     addLogCommand(app, chosen);
     addSettingsCommands(app, chosen);
     addShareCommands(app, chosen);
@@ -97,7 +99,7 @@ ExitCode runProgram(const std::vector<std::string>& words, Console& console) {
     std::vector<std::string> reversed(words.rbegin(), words.rend()); // the parser takes the last word first
     try {
         app.parse(std::move(reversed));
-        runCommand(command, options, console);
+        return runCommand(command, options, console);
     } catch (const CLI::ParseError& error) {
         return endOfParsing(app, error, console);
     } catch (const Failure& failure) {
@@ -105,7 +107,6 @@ ExitCode runProgram(const std::vector<std::string>& words, Console& console) {
         writeFailure(console.err, failure);
         return failure.code();
     }
-    return ExitCode::done;
 }
 
 } // namespace velt::cli

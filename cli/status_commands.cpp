@@ -2,6 +2,7 @@
 #include "base/printable.h"
 #include "cli/command.h"
 #include "cli/failure.h"
+#include "cli/health_count.h"
 #include "cli/json_io.h"
 #include "cli/server_events.h"
 #include "cli/text_table.h"
@@ -41,6 +42,27 @@ void writeReasons(Context& context, const Json::Value& services) {
     }
 }
 
+std::string counted(int count, const std::string& word) {
+    return std::to_string(count) + " " + word + (count == 1 ? "" : "s");
+}
+
+/// A server that cannot tell of its health has a status nevertheless.
+void writeHealth(Context& context) {
+    HealthCount count;
+    try {
+        count = countFindings(context.api.get("/api/health"));
+    } catch (const Failure&) {
+        return;
+    }
+    if (count.grave() > 0) {
+        const std::string errors = count.errors > 0 ? counted(count.errors, "error") : "";
+        const std::string warnings = count.warnings > 0 ? counted(count.warnings, "warning") : "";
+        context.console.out << '\n'
+                            << errors << (count.errors > 0 && count.warnings > 0 ? " and " : "") << warnings
+                            << ": see 'veltctl doctor'.\n";
+    }
+}
+
 void showStatus(Context& context) {
     const Json::Value status = context.api.get("/api/status");
     if (context.wroteJson(status)) {
@@ -54,6 +76,7 @@ void showStatus(Context& context) {
     }
     table.write(context.console.out);
     writeReasons(context, status["services"]);
+    writeHealth(context);
 }
 
 struct EventOptions {

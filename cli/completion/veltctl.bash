@@ -5,7 +5,7 @@ _veltctl_words() {
     local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
         enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
     case $1 in
-        '') echo 'status log events ftp security sftp shares chroot bans tokens export import call' ;;
+        '') echo 'status doctor log events ftp security sftp shares chroot bans tokens export import call' ;;
         ftp | security | sftp) echo 'get set' ;;
         'ftp set') echo "$ftp utf8_mode= enable_utf8= use_utf8=" ;;
         'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
