@@ -53,6 +53,26 @@ HttpResponse tooBusy(const Call& call) {
     return response;
 }
 
+/// While a request is answered that may stop and start services.
+class ChangeUnderWay {
+public:
+    explicit ChangeUnderWay(RequestOrder::Kind kind) : holds_(kind == RequestOrder::Kind::write) {
+        if (holds_) {
+            holdServiceWatch();
+        }
+    }
+    ~ChangeUnderWay() {
+        if (holds_) {
+            releaseServiceWatch();
+        }
+    }
+    ChangeUnderWay(const ChangeUnderWay&) = delete;
+    ChangeUnderWay& operator=(const ChangeUnderWay&) = delete;
+
+private:
+    bool holds_;
+};
+
 } // namespace
 
 App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
@@ -161,6 +181,7 @@ void App::submit(const JobPointer& job, const Route& route) {
 }
 
 HttpResponse App::answer(const Route& route, const Call& call) {
+    const ChangeUnderWay change(route.kind);
     try {
         return route.answer(call);
     } catch (const TokenError& error) {

@@ -3,6 +3,7 @@
 #include "base/file.h"
 #include "base/file_lock.h"
 #include "base/unique_fd.h"
+#include "standalone/control/operation_count.h"
 #include "standalone/control/service_firewall.h"
 #include "standalone/control/start_failure.h"
 #include "standalone/control/supervised_daemon.h"
@@ -18,9 +19,14 @@
 namespace velt {
 namespace {
 
-/// One operation on a daemon at a time, over all threads and processes, as long as the descriptor is held.
-/// Not the lock of the settings: a start may take seconds, in which settings can be read and written.
-Result<UniqueFd> lockOperation(const Daemon& daemon) {
+/// One operation on a daemon at a time, over all threads and processes, as long as this lives. Not the lock
+/// of the settings: a start may take seconds, in which settings can be read and written.
+struct OperationLock {
+    UniqueFd file;
+    OperationMark mark;
+};
+
+Result<OperationLock> lockOperation(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto folder, runFolder());
     const auto file = folder / (std::string(daemon.name) + ".operation");
     UniqueFd lock(::open(file.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, S_IRUSR | S_IWUSR));
@@ -28,7 +34,7 @@ Result<UniqueFd> lockOperation(const Daemon& daemon) {
         return cannot("open", file);
     }
     VELT_RETURN_IF_ERROR(waitForFileLock(lock.get(), file));
-    return lock;
+    return OperationLock{std::move(lock), OperationMark(daemon)};
 }
 
 std::vector<int> listenerPorts(const DaemonSettings& settings) {

@@ -1,16 +1,27 @@
 #include "standalone/control/service_watch.h"
 
+#include "base/unique_fd.h"
 #include "standalone/control/daemon_control.h"
+#include "standalone/control/daemon_incidents.h"
+#include "standalone/control/operation_count.h"
+#include "standalone/control/start_retry.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/systemd.h"
 
+#include <poll.h>
+#include <sys/eventfd.h>
+#include <sys/inotify.h>
 #include <syslog.h>
+#include <unistd.h>
 
 #include <algorithm>
-#include <condition_variable>
+#include <array>
+#include <atomic>
+#include <cstdint>
 #include <exception>
+#include <functional>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -29,13 +40,46 @@ constexpr milliseconds interval{500};
 constexpr milliseconds shortestBackOff{1000};
 constexpr milliseconds longestBackOff{30000};
 
+/// So many hold the watch back.
+std::atomic<int>& holds() {
+    static std::atomic<int> count{0};
+    return count;
+}
+
 /// One daemon under watch. A start that fails is tried again, at growing intervals.
 class WatchedDaemon {
 public:
-    explicit WatchedDaemon(const Daemon& daemon) : daemon_(daemon) {}
+    /// `restoresSupervisors`: nobody else starts a supervisor that was killed again.
+    WatchedDaemon(const Daemon& daemon, bool restoresSupervisors)
+        : daemon_(daemon), retry_(daemon), restoresSupervisors_(restoresSupervisors) {}
 
+    /// Tells what has happened. To be called whenever something may have.
     void look() {
+        // Counted before the state is read: what begins in between counts as ours at the next look, too.
+        const std::uint64_t operations = operationCount(daemon_);
+        const bool byUs = operations != operations_ || operations % 2 != 0;
         const DaemonState state = daemonState(daemon_);
+        if (operationCount(daemon_) == operations) {
+            for (const Incident& each : teller_.look(state, byUs, lostItsSupervisor(state))) {
+                recordIncident(daemon_, each);
+            }
+            operations_ = operations;
+        }
+    }
+
+    /// Starts it again where that is for us to do.
+    void mend() {
+        const DaemonState state = daemonState(daemon_);
+        if (restoresSupervisors_) {
+            mendLost(state);
+        }
+        if (!retryAt_ && holds() == 0 && retry_.isDue(state)) {
+            start([this] { return startDaemon(daemon_); });
+        }
+    }
+
+private:
+    void mendLost(const DaemonState& state) {
         const bool lost = lostItsSupervisor(state);
         if (lost && !retryAt_) {
             ::syslog(LOG_ERR, "%s lost its supervisor (process %d); restarting it", titleOf(daemon_).c_str(),
@@ -50,32 +94,70 @@ public:
         }
     }
 
-private:
     void restore() {
-        const auto restored = perform(Effect::start, daemon_.name, [this] { return restoreDaemon(daemon_); });
-        if (restored) {
+        if (start([this] { return restoreDaemon(daemon_); })) {
             retryAt_.reset();
             return;
         }
-        ::syslog(LOG_ERR, "%s", restored.error().message.c_str());
         retryAt_ = Clock::now() + backOff_;
         backOff_ = std::min(backOff_ * 2, longestBackOff);
     }
 
+    bool start(const std::function<Result<>()>& act) {
+        const auto started = perform(Effect::start, daemon_.name, act);
+        const std::string complaint = started ? "" : started.error().message;
+        if (!started && complaint != complaint_) {
+            ::syslog(LOG_ERR, "%s", complaint.c_str());
+        }
+        complaint_ = complaint;
+        if (started && isServing(daemonState(daemon_)) && !teller_.tellsRecovery()) {
+            recordIncident(daemon_, {Incident::Kind::recovered, ""});
+        }
+        return static_cast<bool>(started);
+    }
+
     const Daemon& daemon_;
+    IncidentTeller teller_;
+    StartRetry retry_;
+    bool restoresSupervisors_;
+    std::uint64_t operations_ = 0;
+    std::string complaint_; ///< of the last start
     std::optional<Clock::time_point> retryAt_;
     milliseconds backOff_ = shortestBackOff;
+};
+
+/// Wakes when a supervisor replaces its state file: a daemon that has died is started again a tenth of a
+/// second later, and then its words are gone.
+class StateFolderWatch {
+public:
+    StateFolderWatch() : notify_(::inotify_init1(IN_CLOEXEC | IN_NONBLOCK)), end_(::eventfd(0, EFD_CLOEXEC)) {
+        if (const auto folder = runFolder(); folder && notify_) {
+            ::inotify_add_watch(notify_.get(), folder->c_str(), IN_MOVED_TO | IN_DELETE);
+        }
+    }
+
+    /// Returns after the time, or earlier with a change. False: end() was called.
+    bool wait(milliseconds time) const {
+        std::array<pollfd, 2> events{{{end_.get(), POLLIN, 0}, {notify_.get(), POLLIN, 0}}};
+        ::poll(events.data(), events.size(), static_cast<int>(time.count()));
+        std::array<char, 4096> changes{};
+        while (::read(notify_.get(), changes.data(), changes.size()) > 0) {
+        }
+        return (events[0].revents & POLLIN) == 0;
+    }
+
+    void end() const { ::eventfd_write(end_.get(), 1); }
+
+private:
+    UniqueFd notify_;
+    UniqueFd end_;
 };
 
 class ServiceWatch {
 public:
     ServiceWatch() : thread_([this] { run(); }) {}
     ~ServiceWatch() {
-        {
-            const std::lock_guard lock(mutex_);
-            ended_ = true;
-        }
-        wake_.notify_all();
+        folder_.end();
         thread_.join();
     }
     ServiceWatch(const ServiceWatch&) = delete;
@@ -85,24 +167,25 @@ private:
     void run() {
         std::vector<WatchedDaemon> daemons;
         for (const Daemon* daemon : allDaemons()) {
-            daemons.emplace_back(*daemon);
+            daemons.emplace_back(*daemon, !systemdKeepsSupervisors());
         }
-        std::unique_lock lock(mutex_);
-        while (!wake_.wait_for(lock, interval, [this] { return ended_; })) {
-            lock.unlock();
+        auto next = Clock::now();
+        do {
             try {
                 std::ranges::for_each(daemons, &WatchedDaemon::look);
+                if (Clock::now() >= next) {
+                    next = Clock::now() + interval;
+                    std::ranges::for_each(daemons, &WatchedDaemon::mend);
+                }
             } catch (const std::exception& error) {
                 ::syslog(LOG_ERR, "cannot watch the daemons: %s", error.what());
             }
-            lock.lock();
-        }
+        } while (
+            folder_.wait(std::max(milliseconds(1), std::chrono::ceil<milliseconds>(next - Clock::now()))));
     }
 
-    std::mutex mutex_;
-    std::condition_variable wake_;
-    bool ended_ = false;
-    std::thread thread_; // last: it uses the others
+    StateFolderWatch folder_;
+    std::thread thread_; // last: it uses the other
 };
 
 struct TheWatch {
@@ -119,7 +202,7 @@ TheWatch& theWatch() {
 
 Result<> watchServices() {
     const std::lock_guard lock(theWatch().mutex);
-    if (theWatch().watch != nullptr || systemdKeepsSupervisors()) {
+    if (theWatch().watch != nullptr) {
         return {};
     }
     try {
@@ -128,6 +211,14 @@ Result<> watchServices() {
         return Error(ErrorNumber::daemon, std::string("Cannot start a thread: ") + error.what() + ".");
     }
     return {};
+}
+
+void holdServiceWatch() {
+    ++holds();
+}
+
+void releaseServiceWatch() {
+    --holds();
 }
 
 void unwatchServices() {

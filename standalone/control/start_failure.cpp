@@ -9,25 +9,22 @@
 #include <filesystem>
 
 namespace velt {
-namespace {
 
-std::filesystem::path noteFile(const Daemon& daemon) {
+std::filesystem::path startFailureNote(const Daemon& daemon) {
     return statePath(paths::run) / (std::string(daemon.name) + ".failure");
 }
 
-} // namespace
-
 Result<> noteOutcome(const Daemon& daemon, Result<> outcome) {
     if (outcome) {
-        ::unlink(noteFile(daemon).c_str());
+        ::unlink(startFailureNote(daemon).c_str());
     } else {
-        (void)replaceFile(noteFile(daemon), outcome.error().message, 0644);
+        (void)replaceFile(startFailureNote(daemon), outcome.error().message, 0644);
     }
     return outcome;
 }
 
 std::optional<std::string> startFailure(const Daemon& daemon) {
-    const auto note = readFile(noteFile(daemon));
+    const auto note = readFile(startFailureNote(daemon));
     return note ? std::optional(*note) : std::nullopt;
 }
 

@@ -5,6 +5,7 @@
 #include "base/result.h"
 #include "standalone/daemons/daemon.h"
 
+#include <filesystem>
 #include <optional>
 #include <string>
 
@@ -16,6 +17,9 @@ Result<> noteOutcome(const Daemon& daemon, Result<> outcome);
 
 /// The sentence of the daemon's last start, or restart, when that failed and nothing succeeded since.
 std::optional<std::string> startFailure(const Daemon& daemon);
+
+/// The file that has it; missing when there is none.
+std::filesystem::path startFailureNote(const Daemon& daemon);
 
 } // namespace velt
 

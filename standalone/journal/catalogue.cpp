@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 22> entries{{
+constexpr std::array<CatalogueEntry, 26> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -34,6 +34,10 @@ constexpr std::array<CatalogueEntry, 22> entries{{
     // This system's own, far from those of the modules.
     {0x11BF0001, "Logins from %1 are refused for %2 seconds after %3 failed ones at %4."},
     {0x11BF0002, "The ban of %1 was lifted."},
+    {0x11BF0010, "The %1 service ended unexpectedly: %2."},
+    {0x11BF0011, "The %1 service runs again."},
+    {0x11BF0012, "The %1 service was started by another program."},
+    {0x11BF0013, "The %1 service was stopped by another program."},
 }};
 
 std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4>& texts) {

@@ -133,6 +133,17 @@ std::string_view severityName(Severity severity) {
     return names.at(static_cast<std::size_t>(severity));
 }
 
+void holdServiceWatch() {
+    const std::lock_guard lock(mutex);
+    ++FakeStandalone::instance().watchHolds;
+    ++FakeStandalone::instance().watchHeld;
+}
+
+void releaseServiceWatch() {
+    const std::lock_guard lock(mutex);
+    --FakeStandalone::instance().watchHolds;
+}
+
 void clearLastError() {
     request().sentence = FakeStandalone::instance().sentence;
 }

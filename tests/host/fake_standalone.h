@@ -27,6 +27,8 @@ struct FakeStandalone {
     velt::Findings findings;           ///< of the judgements to come
     int judgements = 0;                ///< how many were made
     std::function<void()> whileJudged; ///< called by each
+    int watchHolds = 0;                ///< how many hold the watch of the services back now
+    int watchHeld = 0;                 ///< and how often that was done
     std::vector<velt::Ban> bans;
     bool bansFail = false;                 ///< with `sentence`
     std::vector<std::string> failedLogins; ///< "SERVICE ADDRESS"

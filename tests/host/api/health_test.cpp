@@ -9,14 +9,15 @@
 
 namespace {
 
+using std::chrono::seconds;
 using velt::Severity;
 using velt::test::waitUntil;
-using std::chrono::seconds;
 
 const velt::Finding expires{"certificate-expires", Severity::warning, "ftp", "It expires soon.",
                             "veltctl restart ftp"};
 const velt::Finding down{"service-down", Severity::error, "sftp", "It does not run.", "veltctl restart sftp"};
-const velt::Finding remark{"external-address-private", Severity::notice, "ftp", "It is private.", "veltctl x"};
+const velt::Finding remark{"external-address-private", Severity::notice, "ftp", "It is private.",
+                           "veltctl x"};
 
 class HostHealth : public HostTest {
 protected:
@@ -43,10 +44,11 @@ TEST_F(HostHealth, IsToldWithWhatMendsIt) {
     start();
     const Answer answer = ask("GET", "/api/health", viewer);
     EXPECT_EQ(answer.status, 200);
-    EXPECT_EQ(answer.body,
-              R"({"findings":[{"id":"service-down","mend":"veltctl restart sftp","sentence":"It does not run.",)"
-              R"("severity":"error","subject":"sftp"},{"id":"certificate-expires","mend":"veltctl restart ftp",)"
-              R"("sentence":"It expires soon.","severity":"warning","subject":"ftp"}],"status":"failed"})");
+    EXPECT_EQ(
+        answer.body,
+        R"({"findings":[{"id":"service-down","mend":"veltctl restart sftp","sentence":"It does not run.",)"
+        R"("severity":"error","subject":"sftp"},{"id":"certificate-expires","mend":"veltctl restart ftp",)"
+        R"("sentence":"It expires soon.","severity":"warning","subject":"ftp"}],"status":"failed"})");
 }
 
 TEST_F(HostHealth, IsAsGoodAsTheWorstFinding) {
@@ -138,8 +140,9 @@ TEST_F(HostHealth, FindingsAreMeasured) {
     start();
     const std::string error = R"(velt_health_findings{id="service-down",severity="error"} 1)";
     EXPECT_TRUE(waitUntil([&] { return get("/metrics").body.find(error) != std::string::npos; }, seconds(5)));
-    EXPECT_NE(get("/metrics").body.find(R"(velt_health_findings{id="certificate-expires",severity="warning"} 1)"),
-              std::string::npos);
+    EXPECT_NE(
+        get("/metrics").body.find(R"(velt_health_findings{id="certificate-expires",severity="warning"} 1)"),
+        std::string::npos);
     fake.findings = {expires};
     std::this_thread::sleep_for(std::chrono::milliseconds(1100));
     EXPECT_EQ(get("/api/health").json()["findings"].size(), 1U);

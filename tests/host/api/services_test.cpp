@@ -71,6 +71,16 @@ TEST_F(HostServices, AServiceWithFormerSettingsIsNotDoneEither) {
                                        "settings. The configuration was refused.");
 }
 
+TEST_F(HostServices, NothingElseStartsServicesDuringAChange) {
+    access.watchHeld = 0;
+    EXPECT_EQ(get(sftp + "get").status, 200);
+    EXPECT_EQ(access.watchHeld, 0) << "a read changes nothing";
+    EXPECT_EQ(post(sftp + "set", R"({"enable":true})").status, 204);
+    EXPECT_EQ(access.watchHeld, 1);
+    stop();
+    EXPECT_EQ(access.watchHolds, 0);
+}
+
 TEST_F(HostServices, ReadsAndRefusalsStartNothing) {
     access.down = {ftpDown};
     EXPECT_EQ(get(sftp + "get").status, 200);

@@ -7,8 +7,11 @@
 
 #include <algorithm>
 #include <csignal>
+#include <mutex>
 #include <optional>
+#include <string>
 #include <thread>
+#include <vector>
 
 namespace velt::test {
 namespace {
@@ -153,6 +156,152 @@ TEST_F(ServiceWatchTest, EndsAtOnceAndCanBeTakenUpAgain) {
     EXPECT_TRUE(isAlive(former.daemon)) << "nobody watches";
     ASSERT_EQ(messageOf(watchServices()), "");
     EXPECT_TRUE(waitUntil([&] { return isRestored("ftpd", former); }, promised_));
+}
+
+/// The sentences of the administrator log, oldest first.
+std::vector<std::string> logged() {
+    std::vector<std::string> sentences;
+    for (const LogEntry& entry : queryLog({}).valueOr({})) {
+        sentences.insert(sentences.begin(), entry.sentence);
+    }
+    return sentences;
+}
+
+/// The actions of the events for a service, in their order.
+class Actions {
+public:
+    explicit Actions(std::string service)
+        : subscription_(subscribeEvents([this, service = std::move(service)](const SystemEvent& event) {
+              const std::lock_guard lock(mutex_);
+              if (event.name == "velt.service.action" && event.parameters.at("SERVICE_NAME") == service) {
+                  actions_ += (actions_.empty() ? "" : " ") + event.parameters.at("SERVICE_ACTION");
+              }
+          })) {}
+    ~Actions() { unsubscribe(subscription_); }
+    Actions(const Actions&) = delete;
+    Actions& operator=(const Actions&) = delete;
+
+    std::string seen() {
+        const std::lock_guard lock(mutex_);
+        return actions_;
+    }
+
+private:
+    std::mutex mutex_;
+    std::string actions_;
+    Subscription subscription_; // last: it uses the others
+};
+
+TEST_F(ServiceWatchTest, ADaemonThatDiesAndComesBackIsLoggedWithItsReason) {
+    Actions ftp("ftpd");
+    Actions sftp("sftp");
+    ASSERT_EQ(messageOf(watchServices()), "");
+    signalProcess(daemonOf("ftpd"), SIGKILL);
+    EXPECT_TRUE(waitUntil([&] { return ftp.seen() == "ended recovered"; }, seconds(4))) << ftp.seen();
+    signalProcess(daemonOf("sftp"), SIGKILL);
+    EXPECT_TRUE(waitUntil([&] { return sftp.seen() == "ended recovered"; }, seconds(4))) << sftp.seen();
+    EXPECT_EQ(logged(),
+              (std::vector<std::string>{"The FTP service ended unexpectedly: it was ended by signal 9.",
+                                        "The FTP service runs again.",
+                                        "The SFTP service ended unexpectedly: it was ended by signal 9.",
+                                        "The SFTP service runs again."}));
+}
+
+TEST_F(ServiceWatchTest, AKilledSupervisorIsLogged) {
+    Actions ftp("ftpd");
+    ASSERT_EQ(messageOf(watchServices()), "");
+    std::this_thread::sleep_for(milliseconds(100));
+    kill(serviceState("ftpd").supervisor);
+    EXPECT_TRUE(waitUntil([&] { return ftp.seen() == "ended recovered"; }, seconds(4))) << ftp.seen();
+    EXPECT_EQ(logged(),
+              (std::vector<std::string>{"The FTP service ended unexpectedly: its supervisor was killed.",
+                                        "The FTP service runs again."}));
+}
+
+TEST_F(ServiceWatchTest, WhatAnotherProgramStopsAndStartsIsLogged) {
+    Actions ftp("ftpd");
+    ASSERT_EQ(messageOf(watchServices()), "");
+    std::this_thread::sleep_for(milliseconds(100));
+    signalProcess(serviceState("ftpd").supervisor, SIGTERM);
+    EXPECT_TRUE(waitUntil([&] { return ftp.seen() == "stopped"; }, seconds(4))) << ftp.seen();
+    std::this_thread::sleep_for(milliseconds(1200));
+    EXPECT_FALSE(accepts(ftpPort_)) << "who stopped it meant it";
+    EXPECT_EQ(logged(), (std::vector<std::string>{"The FTP service was stopped by another program."}));
+}
+
+TEST_F(ServiceWatchTest, WhatThisProgramDoesIsNotLogged) {
+    Actions ftp("ftpd");
+    ASSERT_EQ(messageOf(watchServices()), "");
+    for (int i = 0; i < 3; ++i) {
+        ASSERT_EQ(VLIBServiceStop("ftpd", 0), 0) << lastErrorSentence();
+        ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    }
+    std::this_thread::sleep_for(milliseconds(700));
+    EXPECT_EQ(ftp.seen(), "");
+    EXPECT_EQ(logged(), std::vector<std::string>());
+}
+
+/// A start that failed before the watch began, as at a boot.
+class FailedBootStart : public ServiceWatchTest {
+protected:
+    void SetUp() override {
+        ServicesTest::SetUp();
+        other_.emplace(ftpPort_);
+        ASSERT_NE(messageOf(startEnabledServices()), "");
+        ASSERT_EQ(messageOf(watchServices()), "");
+        std::this_thread::sleep_for(milliseconds(700)); // it has looked
+    }
+
+    std::optional<Listener> other_; ///< holds the port
+};
+
+TEST_F(FailedBootStart, IsTriedAgainAsSoonAsThePortIsFree) {
+    Actions ftp("ftpd");
+    other_.reset();
+    EXPECT_TRUE(waitUntil([this] { return accepts(ftpPort_); }, seconds(4)));
+    EXPECT_TRUE(waitUntil([&] { return ftp.seen() == "recovered"; }, seconds(2))) << ftp.seen();
+    EXPECT_EQ(servicesDown().size(), 0U);
+    EXPECT_EQ(logged(), (std::vector<std::string>{"The FTP service runs again."}));
+}
+
+TEST_F(FailedBootStart, IsTriedAgainWhenAFileChanges) {
+    const int before = ftpPlans();
+    std::this_thread::sleep_for(milliseconds(1200));
+    EXPECT_EQ(ftpPlans(), before) << "nothing has changed";
+    ftpPort_ = freePort();
+    storeFtp(plain);
+    EXPECT_TRUE(waitUntil([this] { return accepts(ftpPort_); }, seconds(4)));
+}
+
+TEST_F(FailedBootStart, WaitsForAChangeThatIsUnderWay) {
+    holdServiceWatch();
+    other_.reset();
+    std::this_thread::sleep_for(milliseconds(1700));
+    EXPECT_FALSE(accepts(ftpPort_));
+    releaseServiceWatch();
+    EXPECT_TRUE(waitUntil([this] { return accepts(ftpPort_); }, seconds(4)));
+}
+
+TEST_F(FailedBootStart, OfAServiceThatIsSwitchedOffIsForgotten) {
+    storeFtp(0);
+    other_.reset();
+    std::this_thread::sleep_for(milliseconds(1700));
+    EXPECT_FALSE(accepts(ftpPort_));
+}
+
+TEST_F(FailedBootStart, DoesNotBringBackWhatWasStoppedAfterIt) {
+    other_.reset();
+    ASSERT_TRUE(waitUntil([this] { return accepts(ftpPort_); }, seconds(4)));
+    storeFtp(plain, 500); // a later change fails, and the service goes on
+    planDouble().refuse = true;
+    EXPECT_LT(VLIBServicectlStop("ftpd", 0), 0);
+    std::this_thread::sleep_for(milliseconds(700));
+    planDouble().refuse = false;
+    signalProcess(serviceState("ftpd").supervisor, SIGTERM);
+    ASSERT_TRUE(waitUntil([this] { return !accepts(ftpPort_); }, seconds(4)));
+    storeFtp(plain, 600);
+    std::this_thread::sleep_for(milliseconds(1700));
+    EXPECT_FALSE(accepts(ftpPort_)) << "who stopped it meant it";
 }
 
 } // namespace
