@@ -58,7 +58,7 @@ public:
         // Counted before the state is read: what begins in between counts as ours at the next look, too.
         const std::uint64_t operations = operationCount(daemon_);
         const bool byUs = operations != operations_ || operations % 2 != 0;
-        const DaemonState state = daemonState(daemon_);
+        const DaemonState state = currentState();
         if (operationCount(daemon_) == operations) {
             for (const Incident& each : teller_.look(state, byUs, lostItsSupervisor(state))) {
                 recordIncident(daemon_, each);
@@ -69,7 +69,7 @@ public:
 
     /// Starts it again where that is for us to do.
     void mend() {
-        const DaemonState state = daemonState(daemon_);
+        const DaemonState state = currentState();
         if (restoresSupervisors_) {
             mendLost(state);
         }
@@ -79,6 +79,13 @@ public:
     }
 
 private:
+    /// A supervisor that is told to stop may end between the reading of its file and the look whether it
+    /// lives; what it leaves says then that it was told to.
+    DaemonState currentState() const {
+        DaemonState state = daemonState(daemon_);
+        return lostItsSupervisor(state) ? daemonState(daemon_) : state;
+    }
+
     void mendLost(const DaemonState& state) {
         const bool lost = lostItsSupervisor(state);
         if (lost && !retryAt_) {
@@ -155,7 +162,14 @@ private:
 
 class ServiceWatch {
 public:
-    ServiceWatch() : thread_([this] { run(); }) {}
+    ServiceWatch() {
+        for (const Daemon* daemon : allDaemons()) {
+            daemons_.emplace_back(*daemon, !systemdKeepsSupervisors());
+        }
+        // Before this returns, so that whatever happens from then on is told.
+        attempt([this] { std::ranges::for_each(daemons_, &WatchedDaemon::look); });
+        thread_ = std::thread([this] { run(); });
+    }
     ~ServiceWatch() {
         folder_.end();
         thread_.join();
@@ -164,28 +178,29 @@ public:
     ServiceWatch& operator=(const ServiceWatch&) = delete;
 
 private:
-    void run() {
-        std::vector<WatchedDaemon> daemons;
-        for (const Daemon* daemon : allDaemons()) {
-            daemons.emplace_back(*daemon, !systemdKeepsSupervisors());
+    static void attempt(const std::function<void()>& act) {
+        try {
+            act();
+        } catch (const std::exception& error) {
+            ::syslog(LOG_ERR, "cannot watch the daemons: %s", error.what());
         }
+    }
+
+    void run() {
         auto next = Clock::now();
         do {
-            try {
-                std::ranges::for_each(daemons, &WatchedDaemon::look);
-                if (Clock::now() >= next) {
-                    next = Clock::now() + interval;
-                    std::ranges::for_each(daemons, &WatchedDaemon::mend);
-                }
-            } catch (const std::exception& error) {
-                ::syslog(LOG_ERR, "cannot watch the daemons: %s", error.what());
+            attempt([this] { std::ranges::for_each(daemons_, &WatchedDaemon::look); });
+            if (Clock::now() >= next) {
+                next = Clock::now() + interval;
+                attempt([this] { std::ranges::for_each(daemons_, &WatchedDaemon::mend); });
             }
         } while (
             folder_.wait(std::max(milliseconds(1), std::chrono::ceil<milliseconds>(next - Clock::now()))));
     }
 
     StateFolderWatch folder_;
-    std::thread thread_; // last: it uses the other
+    std::vector<WatchedDaemon> daemons_;
+    std::thread thread_; // last: it uses the others
 };
 
 struct TheWatch {

@@ -114,7 +114,7 @@ Finding unknownAccount(const NamedAccount& account, const std::string& place) {
     return {inRule ? "rules-unknown-account" : "shares-unknown-account", Severity::warning,
             inRule ? "chroot" : "shares", "There is no " + what + ", which " + place + " names.",
             inRule
-                ? "veltctl chroot rules load"
+                ? "Make the account again, or remove its line from " + quoted(statePath(paths::chrootRules))
                 : "Correct the name in " + quoted(statePath(paths::shares)) + ", then run: veltctl doctor"};
 }
 

@@ -15,7 +15,7 @@
 namespace velt {
 namespace {
 
-constexpr std::uint64_t mebibyte = 1024 * 1024;
+constexpr std::uint64_t mebibyte = std::uint64_t{1024} * 1024;
 constexpr std::uint64_t tooFew = 8 * mebibyte;
 constexpr std::uint64_t few = 100 * mebibyte;
 constexpr std::uint64_t fewFiles = 100;

@@ -3,9 +3,9 @@
 #define VELT_STANDALONE_HEALTH_NAMED_ACCOUNTS_H
 
 #include <chrono>
-#include <compare>
 #include <optional>
 #include <string>
+#include <tuple>
 #include <vector>
 
 namespace velt {
@@ -16,7 +16,9 @@ struct NamedAccount {
     std::string name; ///< "" where it is known by its number
     unsigned id = 0;
 
-    auto operator<=>(const NamedAccount&) const = default;
+    bool operator<(const NamedAccount& other) const {
+        return std::tie(isUser, name, id) < std::tie(other.isUser, other.name, other.id);
+    }
 };
 
 /// Those that no source knows; accounts of /etc/velt/ftp.passwd and ftp.group are known, too. Nothing when

@@ -210,7 +210,6 @@ TEST_F(ServiceWatchTest, ADaemonThatDiesAndComesBackIsLoggedWithItsReason) {
 TEST_F(ServiceWatchTest, AKilledSupervisorIsLogged) {
     Actions ftp("ftpd");
     ASSERT_EQ(messageOf(watchServices()), "");
-    std::this_thread::sleep_for(milliseconds(100));
     kill(serviceState("ftpd").supervisor);
     EXPECT_TRUE(waitUntil([&] { return ftp.seen() == "ended recovered"; }, seconds(4))) << ftp.seen();
     EXPECT_EQ(logged(),
@@ -221,7 +220,6 @@ TEST_F(ServiceWatchTest, AKilledSupervisorIsLogged) {
 TEST_F(ServiceWatchTest, WhatAnotherProgramStopsAndStartsIsLogged) {
     Actions ftp("ftpd");
     ASSERT_EQ(messageOf(watchServices()), "");
-    std::this_thread::sleep_for(milliseconds(100));
     signalProcess(serviceState("ftpd").supervisor, SIGTERM);
     EXPECT_TRUE(waitUntil([&] { return ftp.seen() == "stopped"; }, seconds(4))) << ftp.seen();
     std::this_thread::sleep_for(milliseconds(1200));
