@@ -203,6 +203,11 @@ static int keep_way(const char* folder, const char* name, int whole, struct stat
     return more == 0 ? 1 : errno == ENOENT || errno == ENOTDIR ? 0 : -1;
 }
 
+/* Whether it is how things are, and not a failure of the moment. */
+static int is_out_of_reach(int error) {
+    return error == EACCES || error == EPERM || error == ELOOP || error == ENAMETOOLONG;
+}
+
 /* The name without its star. */
 static const char* stem_of(const char* name, char* stem, size_t size) {
     (void)snprintf(stem, size, "%.*s", (int)strcspn(name, "*"), name);
@@ -223,8 +228,9 @@ int velt_keep_home(const char* home) {
     }
     homes[home_count++] = identity_of(&status);
     for (const char* const* name = own_names; *name != NULL; name++) {
-        /* What cannot be reached with root's rights either is recognised by its name alone. */
-        if (keep_way(home, stem_of(*name, stem, sizeof(stem)), 1, &status) < 0 && errno == ENOMEM) {
+        /* What cannot be reached with root's rights either is recognised by its name alone. Any other failure
+         * may be over in a moment, and what it hid could be changed then. */
+        if (keep_way(home, stem_of(*name, stem, sizeof(stem)), 1, &status) < 0 && !is_out_of_reach(errno)) {
             return -1;
         }
     }
@@ -253,21 +259,25 @@ static int is_named(const char* const* names, const char* name) {
     return 0;
 }
 
+/* 1 when the child stands at one of these names, 0 when it does not, -1 with errno. */
 static int stands_at(const char* const* names, int folder, const struct stat* child) {
     char stem[NAME_MAX + 1];
     struct stat status;
 
     for (; *names != NULL; names++) {
-        if (fstatat(folder, stem_of(*names, stem, sizeof(stem)), &status, 0) == 0 &&
-            is(identity_of(child), &status)) {
-            return 1;
+        if (fstatat(folder, stem_of(*names, stem, sizeof(stem)), &status, 0) == 0) {
+            if (is(identity_of(child), &status)) {
+                return 1;
+            }
+        } else if (errno != ENOENT && errno != ENOTDIR && !is_out_of_reach(errno)) {
+            return -1;
         }
     }
     return 0;
 }
 
 /* One folder on the way up from a place: `name` is the place's name when this is its own folder, else NULL,
- * and `child` is the folder from which the way came. */
+ * and `child` is the folder from which the way came. 1, 0 or -1 as below. */
 static int keeps(int folder, const struct stat* here, int at_root, const char* name,
                  const struct stat* child) {
     const char* const* tables[most_homes + 1];
@@ -282,8 +292,9 @@ static int keeps(int folder, const struct stat* here, int at_root, const char* n
         tables[count++] = root_names;
     }
     for (size_t i = 0; i < count; i++) {
-        if (name != NULL ? is_named(tables[i], name) : stands_at(tables[i], folder, child)) {
-            return 1;
+        int stands = name != NULL ? is_named(tables[i], name) : stands_at(tables[i], folder, child);
+        if (stands != 0) {
+            return stands;
         }
     }
     return is_kept(here, 1);
@@ -327,6 +338,9 @@ int velt_may_change(int folder, const char* name, enum velt_change change) {
         return 0;
     }
     int exists = fstatat(folder, name, &status, AT_SYMLINK_NOFOLLOW) == 0;
+    if (!exists && errno != ENOENT && !is_out_of_reach(errno)) {
+        return -1;
+    }
     int refused = exists && is_kept(&status, change == velt_changes_content);
     if (!refused) {
         int copy = fcntl(folder, F_DUPFD_CLOEXEC, 0);

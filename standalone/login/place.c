@@ -33,7 +33,7 @@ static int take_target(struct velt_place* place) {
 
     ssize_t length = readlinkat(place->folder, place->name, target, sizeof(target) - 1);
     if (length < 0) {
-        return 0;
+        return errno == EINVAL || errno == ENOENT ? 0 : -1;
     }
     target[length] = '\0';
     /* split() ended the path before the name. */
