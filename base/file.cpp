@@ -81,6 +81,13 @@ bool fileExists(const fs::path& path) {
     return ::access(path.c_str(), F_OK) == 0;
 }
 
+Result<bool> isThere(const fs::path& path) {
+    const bool there = fileExists(path);
+    if (!there && errno != ENOENT && errno != ENOTDIR)
+        return cannot("look at", path);
+    return there;
+}
+
 // Each new folder is made durable in the one that holds it, or a crash could take it away again together with
 // the file that was stored in it.
 Result<> makeFolder(const fs::path& folder) {

@@ -43,6 +43,9 @@ UniqueFd openLocked(const std::filesystem::path& path, int flags, mode_t mode);
 /// Whether there is a file or folder; false also when that cannot be told.
 bool fileExists(const std::filesystem::path& path);
 
+/// The same; an error when that cannot be told.
+Result<bool> isThere(const std::filesystem::path& path);
+
 /// Makes the folder, and those above it, where they are missing; durable on return.
 Result<> makeFolder(const std::filesystem::path& folder);
 

@@ -7,7 +7,9 @@
 
 #include <fcntl.h>
 #include <sys/file.h>
+#include <unistd.h>
 
+#include <cerrno>
 #include <cstdlib>
 #include <string>
 #include <string_view>
@@ -42,7 +44,9 @@ Result<ScratchFolder> ScratchFolder::make() {
     }
     UniqueFd lock = lockedFolder(path);
     if (!lock) {
-        return cannot("lock", path);
+        const int reason = errno;
+        ::rmdir(path.c_str());
+        return cannot("lock", path, reason);
     }
     return ScratchFolder(path, std::move(lock));
 }

@@ -10,7 +10,6 @@
 #include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 
-#include <algorithm>
 #include <array>
 #include <memory>
 #include <string>
@@ -52,12 +51,23 @@ std::vector<std::filesystem::path> keysIn(const std::filesystem::path& folder) {
 
 Result<> makeMissing(const std::vector<std::filesystem::path>& keys) {
     for (std::size_t i = 0; i < keys.size(); i++) {
-        if (fileExists(keys[i])) {
+        VELT_ASSIGN_OR_RETURN(const bool there, isThere(keys[i]));
+        if (there) {
             continue;
         }
         VELT_RETURN_IF_ERROR(makeKey(std::string(kinds[i]), keys[i]));
     }
     return {};
+}
+
+Result<bool> allAreThere(const std::vector<std::filesystem::path>& keys) {
+    for (const auto& key : keys) {
+        VELT_ASSIGN_OR_RETURN(const bool there, isThere(key));
+        if (!there) {
+            return false;
+        }
+    }
+    return true;
 }
 
 // A configuration under test needs keys even where none may be stored.
@@ -73,11 +83,12 @@ Result<HostKeys> throwAwayKeys() {
 Result<HostKeys> hostKeys() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     HostKeys keys{keysIn(statePath(paths::hostKeys)), nullptr};
-    if (std::ranges::all_of(keys.files, fileExists)) {
-        return keys;
+    VELT_ASSIGN_OR_RETURN(bool complete, allAreThere(keys.files));
+    if (!complete) {
+        VELT_RETURN_IF_ERROR(perform(Effect::store, "host keys", [&] { return makeMissing(keys.files); }));
+        VELT_ASSIGN_OR_RETURN(complete, allAreThere(keys.files));
     }
-    VELT_RETURN_IF_ERROR(perform(Effect::store, "host keys", [&] { return makeMissing(keys.files); }));
-    return std::ranges::all_of(keys.files, fileExists) ? Result<HostKeys>(std::move(keys)) : throwAwayKeys();
+    return complete ? Result<HostKeys>(std::move(keys)) : throwAwayKeys();
 }
 
 } // namespace velt

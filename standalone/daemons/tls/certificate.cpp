@@ -98,10 +98,10 @@ Result<ServerCertificate> loadGiven(const Pair& pair) {
 }
 
 // A crash between the two writes of a renewal leaves an old certificate with a new key, which is not usable
-// either.
-bool isUsable(const Pair& pair) {
-    const auto certificateText = readFile(pair.certificate);
-    const auto keyText = readFile(pair.key);
+// either. One that cannot be read this time may be, and clients know this server by it.
+Result<bool> isUsable(const Pair& pair) {
+    VELT_ASSIGN_OR_RETURN(const auto certificateText, readOptionalFile(pair.certificate));
+    VELT_ASSIGN_OR_RETURN(const auto keyText, readOptionalFile(pair.key));
     const CertificateOwner certificate = certificateText ? parseCertificate(*certificateText) : nullptr;
     const KeyOwner key = keyText ? parseKey(*keyText) : nullptr;
     const bool usable = certificate && key && X509_check_private_key(certificate.get(), key.get()) == 1 &&
@@ -137,32 +137,39 @@ Pair ownPair() {
     return {statePath(paths::ownCertificate), statePath(paths::ownKey)};
 }
 
-bool isThere(const Pair& pair) {
-    return fileExists(pair.certificate) || fileExists(pair.key);
+Result<bool> isThere(const Pair& pair) {
+    VELT_ASSIGN_OR_RETURN(const bool certificate, velt::isThere(pair.certificate));
+    VELT_ASSIGN_OR_RETURN(const bool key, velt::isThere(pair.key));
+    return certificate || key;
 }
 
 } // namespace
 
 Result<ServerCertificate> serverCertificate() {
-    if (const Pair given = givenPair(); isThere(given)) {
+    const Pair given = givenPair();
+    VELT_ASSIGN_OR_RETURN(const bool isGiven, isThere(given));
+    if (isGiven) {
         return loadGiven(given);
     }
     const Pair own = ownPair();
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    if (isUsable(own)) {
-        return load(own);
+    VELT_ASSIGN_OR_RETURN(bool usable, isUsable(own));
+    if (!usable) {
+        VELT_RETURN_IF_ERROR(perform(Effect::store, "certificate", [&] { return makeOwn(own); }));
+        VELT_ASSIGN_OR_RETURN(usable, isUsable(own));
     }
-    VELT_RETURN_IF_ERROR(perform(Effect::store, "certificate", [&] { return makeOwn(own); }));
-    return isUsable(own) ? load(own) : throwAway();
+    return usable ? load(own) : throwAway();
 }
 
 Result<std::optional<ServerCertificate>> storedCertificate() {
     const Pair given = givenPair();
     const Pair own = ownPair();
-    if (!isThere(given) && !isThere(own)) {
+    VELT_ASSIGN_OR_RETURN(const bool isGiven, isThere(given));
+    VELT_ASSIGN_OR_RETURN(const bool isOwn, isThere(own));
+    if (!isGiven && !isOwn) {
         return std::optional<ServerCertificate>();
     }
-    VELT_ASSIGN_OR_RETURN(auto certificate, isThere(given) ? loadGiven(given) : load(own));
+    VELT_ASSIGN_OR_RETURN(auto certificate, isGiven ? loadGiven(given) : load(own));
     return std::optional(std::move(certificate));
 }
 
