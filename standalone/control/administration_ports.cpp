@@ -112,8 +112,10 @@ Result<std::vector<AdministrationPort>> administrationPorts() {
         }
     }
     std::ranges::sort(found, {}, &AdministrationPort::port);
-    const auto repeated = std::ranges::unique(found, {}, &AdministrationPort::port);
-    found.erase(repeated.begin(), repeated.end());
+    const auto samePort = [](const AdministrationPort& one, const AdministrationPort& other) {
+        return one.port == other.port;
+    };
+    found.erase(std::unique(found.begin(), found.end(), samePort), found.end());
     return found;
 }
 
