@@ -1,9 +1,9 @@
 // What the platform library offers the program that loads the module over it, beside the contract.
 //
 // A host, at its start: openState, the subscriptions, startEnabledServices, watchServices. Then, for each
-// request, on the thread that serves it: setRequestActor, clearLastError, the module's entry function, and
-// after a failure lastErrorSentence or lastPortConflict for the answer. A change that was accepted is in
-// force when servicesDown is empty after it.
+// request, on the thread that serves it: setRequestActor, clearLastError, a ServiceRequest around the
+// module's entry function, and after a failure lastErrorSentence or lastPortConflict for the answer. A change
+// that was accepted is in force when servicesDown is empty after it.
 //
 // Unless it says otherwise a function may be called from any thread.
 #ifndef VELT_STANDALONE_STANDALONE_H
@@ -13,6 +13,9 @@
 #include "standalone/control/open_state.h"
 #include "standalone/control/service_watch.h"
 #include "standalone/control/start_services.h"
+
+// The frame of a request: what it makes of stops and starts, and which sessions end.
+#include "standalone/control/service_request.h"
 
 // Which services there are, which are down, and who holds a port.
 #include "standalone/contract/last_port_conflict.h"

@@ -51,8 +51,9 @@ std::optional<std::string> readReport(int descriptor) {
 
 Result<> ChildLauncher::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
     VELT_ASSIGN_OR_RETURN(auto pipe, makePipe());
-    std::vector<std::string> arguments{installedFile("velt-supervise").string(), folder.string(), daemon_,
-                                       order.configurationHash, joinPorts(order.ports, ",")};
+    std::vector<std::string> arguments{
+        installedFile("velt-supervise").string(), folder.string(), daemon_, order.configurationHash,
+        std::string(order.sharesPorts ? sharedPortsPrefix : "") + joinPorts(order.ports, ",")};
     arguments.insert(arguments.end(), order.arguments.begin(), order.arguments.end());
     VELT_RETURN_IF_ERROR(spawnDetached(arguments, pipe.writeEnd.get()));
     pipe.writeEnd.reset();

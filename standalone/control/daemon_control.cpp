@@ -4,6 +4,7 @@
 #include "base/file_lock.h"
 #include "base/unique_fd.h"
 #include "standalone/control/operation_count.h"
+#include "standalone/control/pending_stops.h"
 #include "standalone/control/service_firewall.h"
 #include "standalone/control/start_failure.h"
 #include "standalone/control/supervised_daemon.h"
@@ -18,6 +19,9 @@
 
 namespace velt {
 namespace {
+
+// Within this time who has connected has logged in, or is disconnected.
+constexpr std::chrono::seconds loginLimit{60};
 
 /// One operation on a daemon at a time, over all threads and processes, as long as this lives. Not the lock
 /// of the settings: a start may take seconds, in which settings can be read and written.
@@ -72,29 +76,73 @@ Result<> followedByFirewall(Result<> outcome) {
     return outcome;
 }
 
+/// Notes what became of the sessions, for those who want to know at the end of the request.
+Result<> counted(const Daemon& daemon, const Result<SessionCount>& done) {
+    if (!done) {
+        return done.error();
+    }
+    pendingStops().count(daemon, *done);
+    return {};
+}
+
+/// Whether the sessions end that the daemon has when it takes up the plan.
+bool endsSessions(const Daemon& daemon, const DaemonPlan& plan, const std::string& former) {
+    const PendingStops& request = pendingStops();
+    if (request.policy != SessionPolicy::byChange) {
+        return request.policy == SessionPolicy::end && !request.ended.contains(&daemon);
+    }
+    return !former.empty() && former != plan.order.configurationHash &&
+           daemon.takesRights(plan.folder.parent_path() / former, plan.folder);
+}
+
 Result<> startPlanned(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto plan, daemon.plan());
     SupervisedDaemon supervised(daemon);
     if (!plan) {
-        return supervised.stop();
+        return counted(daemon, supervised.stop());
     }
-    auto started = supervised.start(plan->order);
+    const std::string former = daemonState(daemon).configurationHash;
+    auto started = counted(daemon, supervised.start(plan->order, endsSessions(daemon, *plan, former)));
     if (started) {
-        removeFormerPlans(*plan);
+        if (pendingStops().isOpen()) {
+            pendingStops().ended.insert(&daemon);
+        }
+        if (!former.empty() && former != plan->order.configurationHash) {
+            setAside(plan->folder.parent_path() / former);
+        }
+        removeFormerPlans(*plan, loginLimit);
     }
     return started;
+}
+
+/// Whether the end waits, since the thread's request may still have the daemon go on.
+bool isPutOff(const Daemon& daemon, PendingStops::Kind kind) {
+    PendingStops& request = pendingStops();
+    const auto settings = daemon.settings();
+    const bool waits = request.isOpen() && !request.finishing && settings && settings->enabled() &&
+                       isServing(daemonState(daemon));
+    if (waits) {
+        request.waiting.insert_or_assign(&daemon, kind);
+    } else {
+        request.waiting.erase(&daemon);
+    }
+    return waits;
 }
 
 } // namespace
 
 Result<> startDaemon(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
+    pendingStops().waiting.erase(&daemon);
     return followedByFirewall(noteOutcome(daemon, startPlanned(daemon)));
 }
 
 Result<> stopDaemon(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
-    VELT_RETURN_IF_ERROR(SupervisedDaemon(daemon).stop());
+    if (isPutOff(daemon, PendingStops::Kind::stop)) {
+        return {};
+    }
+    VELT_RETURN_IF_ERROR(counted(daemon, SupervisedDaemon(daemon).stop()));
     return followedByFirewall(noteOutcome(daemon, {}));
 }
 
@@ -104,8 +152,11 @@ Result<> stopDaemonForRestart(const Daemon& daemon) {
     if (!wanted) {
         return noteOutcome(daemon, wanted.error());
     }
+    if (isPutOff(daemon, PendingStops::Kind::stop)) {
+        return {};
+    }
     // What is still wanted is started next, and the firewall follows that.
-    auto stopped = SupervisedDaemon(daemon).stop();
+    auto stopped = counted(daemon, SupervisedDaemon(daemon).stop());
     return *wanted ? stopped : followedByFirewall(stopped);
 }
 
@@ -114,7 +165,10 @@ Result<> pauseDaemon(const Daemon& daemon) {
         return Error(ErrorNumber::invalid, titleOf(daemon) + " cannot be paused, only stopped.");
     }
     VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
-    return SupervisedDaemon(daemon).pause();
+    if (isPutOff(daemon, PendingStops::Kind::pause)) {
+        return {};
+    }
+    return counted(daemon, SupervisedDaemon(daemon).pause());
 }
 
 bool lostItsSupervisor(const DaemonState& state) {
@@ -130,7 +184,8 @@ Result<> restoreDaemon(const Daemon& daemon) {
         return {};
     }
     VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
-    const auto done = settings.enabled() ? startPlanned(daemon) : SupervisedDaemon(daemon).stop();
+    const auto done =
+        settings.enabled() ? startPlanned(daemon) : counted(daemon, SupervisedDaemon(daemon).stop());
     return followedByFirewall(noteOutcome(daemon, done));
 }
 

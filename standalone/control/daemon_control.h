@@ -9,11 +9,13 @@
 
 namespace velt {
 
-/// Makes the daemon run with the stored settings, or stops it where they give no plan. A start, and a stop
-/// that no start follows, end with followWithFirewall.
+/// Makes the daemon run with the stored settings, or stops it where they give no plan. A daemon that runs
+/// with others hands over: its sessions go on or end as the thread's request says, else by the change. A
+/// start, and a stop that no start follows, end with followWithFirewall.
 Result<> startDaemon(const Daemon& daemon);
 
-/// Ends the daemon and its sessions.
+/// Ends the daemon and its sessions. Within a request (service_request.h), this, the next and a pause wait
+/// for its end or a start, while the daemon serves and is on by the stored settings.
 Result<> stopDaemon(const Daemon& daemon);
 
 /// The same as the first half of a restart: refused, so that the former daemon serves on, when the ports of

@@ -2,6 +2,7 @@
 
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/service_firewall.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
 
 #include <syslog.h>
@@ -34,6 +35,12 @@ Result<> forEachDaemon(Result<> (*act)(const Daemon&)) {
     return outcome;
 }
 
+Result<> reload(const Daemon& daemon) {
+    VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
+    const bool serves = settings.enabled() && isServing(daemonState(daemon));
+    return serves ? perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); }) : Result<>();
+}
+
 } // namespace
 
 Result<> startEnabledServices() {
@@ -43,6 +50,13 @@ Result<> startEnabledServices() {
 
 Result<> stopServices() {
     return forEachDaemon(stop);
+}
+
+Result<std::vector<ServiceSessions>> reloadServices(SessionPolicy policy) {
+    ServiceRequest request(policy);
+    const auto done = forEachDaemon(reload);
+    auto sessions = request.finish();
+    return done ? std::move(sessions) : done.error();
 }
 
 } // namespace velt

@@ -3,6 +3,9 @@
 #define VELT_STANDALONE_CONTROL_START_SERVICES_H
 
 #include "base/result.h"
+#include "standalone/control/service_request.h"
+
+#include <vector>
 
 namespace velt {
 
@@ -14,6 +17,12 @@ Result<> startEnabledServices();
 /// Ends the daemons and their sessions. The settings stay as they are stored, so that startEnabledServices
 /// starts the same ones again. Failures are treated in the same way.
 Result<> stopServices();
+
+/// Has each daemon that serves give way to one with the configuration, certificate, host keys and programs of
+/// now, where these are others than it was started with. FTP accepts connections all the time, SFTP but for
+/// some milliseconds. A daemon that does not come up leaves the former one serving. Tells what became of the
+/// sessions; failures are treated in the same way. Within a ServiceRequest, that one's policy counts.
+Result<std::vector<ServiceSessions>> reloadServices(SessionPolicy policy = SessionPolicy::keep);
 
 } // namespace velt
 

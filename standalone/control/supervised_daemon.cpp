@@ -55,27 +55,38 @@ SupervisedDaemon::SupervisedDaemon(const Daemon& daemon) : SupervisedDaemon(daem
 SupervisedDaemon::SupervisedDaemon(const Daemon& daemon, std::unique_ptr<SupervisorLauncher> launcher)
     : daemon_(daemon), name_(daemon.name), launcher_(std::move(launcher)) {}
 
-Result<> SupervisedDaemon::start(const DaemonOrder& order) {
+Result<SessionCount> SupervisedDaemon::start(const DaemonOrder& order, bool endSessions) {
     VELT_ASSIGN_OR_RETURN(const auto folder, runFolder());
     VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("does not start"));
     const bool supervised = isAlive(now.supervisor);
-    if (supervised && isServing(now) && now.configurationHash == order.configurationHash) {
-        return {};
+    const bool unchanged = supervised && isServing(now) && now.configurationHash == order.configurationHash;
+    if (unchanged && !endSessions) {
+        return SessionCount{};
     }
     VELT_RETURN_IF_ERROR(probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0));
-    const auto started =
-        supervised ? handOver(folder, now.supervisor, order) : launcher_->launch(folder, order);
-    return started ? Result<>() : failure("does not start", started.error().message);
+    const auto started = supervised ? handOver(folder, now.supervisor, {Command::start, order, endSessions})
+                                    : launch(folder, order);
+    return started ? started : failure("does not start", started.error().message);
+}
+
+Result<SessionCount> SupervisedDaemon::launch(const std::filesystem::path& folder, const DaemonOrder& order) {
+    VELT_RETURN_IF_ERROR(launcher_->launch(folder, order));
+    return SessionCount{};
 }
 
 /// Gives the order to the running supervisor.
-Result<> SupervisedDaemon::handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
-                                    const DaemonOrder& order) {
-    const auto answer = askSupervisor(folder, name_, {Command::start, order}, startLimit);
+Result<SessionCount> SupervisedDaemon::handOver(const std::filesystem::path& folder,
+                                                const ProcessId& supervisor, const ControlRequest& request) {
+    const DaemonOrder& order = request.order;
+    const auto answer = askSupervisor(folder, name_, request, startLimit);
     if (!answer) {
         return isGoneSoon(supervisor)
-                   ? launcher_->launch(folder, order)
+                   ? launch(folder, order)
                    : Error("its supervisor, process " + std::to_string(supervisor.pid) + ", does not answer");
+    }
+    if (!*answer && answer->error().message == unknownRequest) { // from before an upgrade
+        const auto stopped = stop();
+        return stopped ? launch(folder, order) : stopped;
     }
     if (!*answer) {
         return *answer;
@@ -85,7 +96,7 @@ Result<> SupervisedDaemon::handOver(const std::filesystem::path& folder, const P
         ::syslog(LOG_ERR, "%s runs, but a restart would use its former settings: %s",
                  titleOf(daemon_).c_str(), kept.error().message.c_str());
     }
-    return {};
+    return *answer;
 }
 
 Error SupervisedDaemon::failure(const std::string& what, std::string_view reason, SourcePlace where) const {
@@ -99,7 +110,7 @@ Result<DaemonState> SupervisedDaemon::knownState(const std::string& what) const 
     return state ? Result<DaemonState>(state->value_or(DaemonState{})) : failure(what, state.error().message);
 }
 
-Result<> SupervisedDaemon::pause() {
+Result<SessionCount> SupervisedDaemon::pause() {
     VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("cannot be paused"));
     if (!isAlive(now.supervisor)) {
         // Without a supervisor nobody could end the sessions later, once their listener is gone and no longer
@@ -107,19 +118,21 @@ Result<> SupervisedDaemon::pause() {
         return stop();
     }
     const auto answer = askSupervisor(statePath(paths::run), name_, {Command::pause, {}}, endLimit);
-    const auto paused = answer.value_or(Error("its supervisor does not answer"));
-    return paused ? Result<>() : failure("cannot be paused", paused.error().message);
+    auto paused = answer.value_or(Error("its supervisor does not answer"));
+    return paused ? paused : failure("cannot be paused", paused.error().message);
 }
 
-Result<> SupervisedDaemon::stop() {
+Result<SessionCount> SupervisedDaemon::stop() {
     VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("cannot be stopped"));
-    std::optional<Result<>> answer;
+    std::optional<Result<SessionCount>> answer;
     if (isAlive(now.supervisor)) {
         answer = askSupervisor(statePath(paths::run), name_, {Command::stop, {}}, endLimit);
     }
-    const auto ended = answer && !*answer ? *answer : launcher_->retire();
-    if (!ended) {
-        return failure("cannot be stopped", ended.error().message);
+    if (answer && !*answer) {
+        return failure("cannot be stopped", answer->error().message);
+    }
+    if (const auto retired = launcher_->retire(); !retired) {
+        return failure("cannot be stopped", retired.error().message);
     }
     // What is left: a supervisor on its last lines, one that hangs, or the daemon of one that was killed.
     DaemonState left = now;
@@ -128,7 +141,7 @@ Result<> SupervisedDaemon::stop() {
         return failure("cannot be stopped", "some of its processes did not end");
     }
     ::unlink(stateFile(statePath(paths::run), name_).c_str());
-    return {};
+    return answer ? **answer : SessionCount{};
 }
 
 DaemonState daemonState(const Daemon& daemon) {

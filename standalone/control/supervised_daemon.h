@@ -6,6 +6,7 @@
 #include "base/result.h"
 #include "standalone/control/supervisor_launcher.h"
 #include "standalone/daemons/daemon.h"
+#include "standalone/supervise/control_channel.h"
 #include "standalone/supervise/daemon_state.h"
 
 #include <filesystem>
@@ -23,20 +24,22 @@ public:
     explicit SupervisedDaemon(const Daemon& daemon);
     SupervisedDaemon(const Daemon& daemon, std::unique_ptr<SupervisorLauncher> launcher);
 
-    /// Makes the daemon run as ordered. Does nothing when one with the same configuration serves already;
-    /// otherwise probes the ports, ends the listener that runs, and returns when the new one listens. Fails
-    /// within 5 s with the daemon's reason.
-    Result<> start(const DaemonOrder& order);
+    /// Makes the daemon run as ordered. One with the same configuration that serves already is left alone;
+    /// otherwise probes the ports, and returns when the new listener has taken the place of the one that
+    /// runs. Sessions go on, unless they are to end; they have ended then. Fails within 5 s with the
+    /// daemon's reason; a listener that ran then runs on where that can be.
+    Result<SessionCount> start(const DaemonOrder& order, bool endSessions = false);
 
     /// Ends the listener only, and waits for its end. Does nothing when it does not run.
-    Result<> pause();
+    Result<SessionCount> pause();
 
     /// Ends the listener and its sessions, and waits for their end. Does nothing when it does not run.
-    Result<> stop();
+    Result<SessionCount> stop();
 
 private:
-    Result<> handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
-                      const DaemonOrder& order);
+    Result<SessionCount> launch(const std::filesystem::path& folder, const DaemonOrder& order);
+    Result<SessionCount> handOver(const std::filesystem::path& folder, const ProcessId& supervisor,
+                                  const ControlRequest& request);
     Result<DaemonState> knownState(const std::string& what) const;
     Error failure(const std::string& what, std::string_view reason,
                   SourcePlace where = SourcePlace::current()) const;

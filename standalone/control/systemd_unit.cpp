@@ -20,6 +20,8 @@ namespace {
 //   over FTP our module keeps such bits from everybody);
 // - code that is made at run time, as some modules do (MemoryDenyWriteExecute=);
 // - the right to mount, for the views of sessions (CAP_SYS_ADMIN, @mount);
+// - the right to look at the listening sockets of a daemon that gives way to its successor (pidfd_getfd and
+//   CAP_SYS_PTRACE), for the supervisor;
 // - the right to change the firewall, for the supervisor, which has it refuse who fails to log in too often
 //   (CAP_NET_ADMIN).
 constexpr std::string_view restrictions =
@@ -28,6 +30,7 @@ constexpr std::string_view restrictions =
     "CAP_SYS_CHROOT CAP_SYS_NICE CAP_SYS_PTRACE CAP_SYS_RESOURCE\n"
     "NoNewPrivileges=yes\n"
     "SystemCallFilter=~@clock @cpu-emulation @debug @module @obsolete @raw-io @reboot @swap\n"
+    "SystemCallFilter=pidfd_getfd\n"
     "SystemCallErrorNumber=EPERM\n"
     "SystemCallArchitectures=native\n"
     "PrivateDevices=yes\n"

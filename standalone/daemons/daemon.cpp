@@ -34,19 +34,25 @@ bool isOn(const Daemon& daemon, const DaemonSettings& settings, std::string_view
            });
 }
 
-void removeFormerPlans(const DaemonPlan& plan) {
+void removeFormerPlans(const DaemonPlan& plan, std::chrono::seconds spared) {
     if (plan.folder.empty()) {
         return;
     }
     // What cannot be removed takes a little room until the next time, no more.
     std::error_code ignored;
+    const auto oldest = std::filesystem::file_time_type::clock::now() - spared;
     for (std::filesystem::directory_iterator entry(plan.folder.parent_path(), ignored), end;
          !ignored && entry != end; entry.increment(ignored)) {
-        if (entry->path() != plan.folder) {
-            std::error_code stays;
+        std::error_code stays;
+        if (entry->path() != plan.folder && entry->last_write_time(stays) <= oldest) {
             std::filesystem::remove_all(entry->path(), stays);
         }
     }
+}
+
+void setAside(const std::filesystem::path& plan) {
+    std::error_code ignored;
+    std::filesystem::last_write_time(plan, std::filesystem::file_time_type::clock::now(), ignored);
 }
 
 std::string titleOf(const Daemon& daemon) {

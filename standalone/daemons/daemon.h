@@ -6,6 +6,7 @@
 #include "ftp/ftp_library.h"
 #include "standalone/supervise/daemon_order.h"
 
+#include <chrono>
 #include <filesystem>
 #include <optional>
 #include <span>
@@ -79,6 +80,10 @@ struct Daemon {
     /// them off, as FTP's; a start by name stops it then.
     Result<std::optional<DaemonPlan>> (*plan)();
 
+    /// Whether a session that began with the configuration in the former folder may do what the one in the
+    /// other would not let it; true also when that cannot be told. Folders are those of plans.
+    bool (*takesRights)(const std::filesystem::path& former, const std::filesystem::path& next);
+
     /// Puts the stored settings to the daemon's own test. Nothing that a running daemon uses is touched.
     Result<> (*test)();
 };
@@ -96,8 +101,12 @@ const Daemon* daemonServing(std::string_view nameInContract);
 bool isOn(const Daemon& daemon, const DaemonSettings& settings, std::string_view nameInContract);
 
 /// Removes what former configurations left beside the folder of this one. To be called when its daemon
-/// serves: until then the former one may be needed again.
-void removeFormerPlans(const DaemonPlan& plan);
+/// serves: until then the former one may be needed again. Those that were written or set aside less than so
+/// long ago stay: who connected to the former daemon may be about to log in.
+void removeFormerPlans(const DaemonPlan& plan, std::chrono::seconds spared = {});
+
+/// Notes that the plan in this folder has a successor from now on.
+void setAside(const std::filesystem::path& plan);
 
 /// "The FTP daemon": how sentences begin.
 std::string titleOf(const Daemon& daemon);

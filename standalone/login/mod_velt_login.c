@@ -13,6 +13,7 @@
 
 #include "standalone/login/file_functions.h"
 #include "standalone/login/login_program.h"
+#include "standalone/login/main_process.h"
 #include "standalone/login/own_files.h"
 #include "standalone/login/refused_commands.h"
 #include "standalone/login/session_mounts.h"
@@ -183,6 +184,13 @@ MODRET set_velt_login_view(cmd_rec* cmd) {
     return PR_HANDLED(cmd);
 }
 
+/* The configuration has been read. */
+static void on_postparse(const void* data, void* ignored) {
+    (void)data;
+    (void)ignored;
+    velt_keep_scoreboard();
+}
+
 /* The daemon is about to serve. Where no session can have mounts of its own, it would start well, and refuse
  * every login. */
 static void on_startup(const void* data, void* ignored) {
@@ -190,6 +198,8 @@ static void on_startup(const void* data, void* ignored) {
     (void)data;
     (void)ignored;
 
+    velt_restore_scoreboard();
+    velt_note_ended_sessions_later();
     if (getuid() != 0) {
         return;
     }
@@ -204,6 +214,9 @@ static void on_startup(const void* data, void* ignored) {
 }
 
 static int velt_init(void) {
+    if (pr_event_register(&velt_login_module, "core.postparse", on_postparse, NULL) < 0) {
+        return -1;
+    }
     return pr_event_register(&velt_login_module, "core.startup", on_startup, NULL);
 }
 
@@ -215,6 +228,9 @@ static int velt_sess_init(void) {
         return -1;
     }
     velt_replace_file_functions(files);
+    /* The daemon's port may be shared with its successor; the ports of data connections are a session's own.
+     */
+    main_server->tcp_reuse_port = -1;
     if (pr_event_register(&velt_login_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
         pr_event_register(&velt_login_module, "core.chroot", on_chroot, NULL) < 0) {
         return -1;

@@ -153,6 +153,21 @@ std::vector<ProcessId> descendantsOf(pid_t ancestor) {
     return descendantsAmong(allProcesses(), ancestor);
 }
 
+std::vector<ProcessId> childrenOf(pid_t parent) {
+    std::vector<ProcessId> children;
+    for (const Relation& relation : allProcesses()) {
+        if (relation.parent == parent) {
+            children.push_back(relation.process);
+        }
+    }
+    return children;
+}
+
+bool isAsleep(const ProcessId& process) {
+    const auto stat = readStat(process.pid).stat;
+    return stat && stat->startTime == process.startTime && stat->state == 'S';
+}
+
 std::vector<ProcessId> livingTrees(const std::vector<ProcessId>& roots) {
     std::vector<ProcessId> living;
     const auto add = [&living](const ProcessId& process) {
@@ -198,6 +213,15 @@ bool endProcesses(const std::function<std::vector<ProcessId>()>& remaining,
         }
         std::this_thread::sleep_for(std::chrono::milliseconds(2));
     }
+}
+
+bool endTrees(std::vector<ProcessId> roots, std::chrono::milliseconds patience) {
+    const auto remaining = [&roots] {
+        // What was once seen below a process stays known when that ends first.
+        roots = livingTrees(roots);
+        return roots;
+    };
+    return endProcesses(remaining, patience);
 }
 
 } // namespace velt

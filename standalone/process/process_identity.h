@@ -40,6 +40,12 @@ void signalProcess(const ProcessId& process, int signal);
 /// The children of a process, their children and so on; the process itself is not among them.
 std::vector<ProcessId> descendantsOf(pid_t ancestor);
 
+/// The children of a process alone.
+std::vector<ProcessId> childrenOf(pid_t parent);
+
+/// Whether the process waits for something: it does not compute at this moment.
+bool isAsleep(const ProcessId& process);
+
 /// The processes of the list that still run, and all that descend from these.
 std::vector<ProcessId> livingTrees(const std::vector<ProcessId>& roots);
 
@@ -47,6 +53,9 @@ std::vector<ProcessId> livingTrees(const std::vector<ProcessId>& roots);
 /// first, SIGKILL when `patience` has passed. False when some are there even a second after that.
 bool endProcesses(const std::function<std::vector<ProcessId>()>& remaining,
                   std::chrono::milliseconds patience);
+
+/// The same with these processes and all that descend from them, also from those that end meanwhile.
+bool endTrees(std::vector<ProcessId> roots, std::chrono::milliseconds patience);
 
 } // namespace velt
 

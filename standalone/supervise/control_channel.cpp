@@ -14,6 +14,7 @@
 #include <array>
 #include <cerrno>
 #include <cstring>
+#include <sstream>
 #include <string_view>
 #include <vector>
 
@@ -21,7 +22,13 @@ namespace velt {
 namespace {
 
 constexpr std::size_t largestMessage = 64UL * 1024;
-constexpr std::string_view failure = "failed "; ///< begins an answer that is not "ok"
+constexpr std::string_view failure = "failed "; ///< begins an answer that is not "ok 3 0"
+constexpr std::string_view success = "ok ";
+/// How a start deals with sessions, and how its ports are had.
+constexpr std::string_view endSessions = "end sessions";
+constexpr std::string_view keepSessions = "keep sessions";
+constexpr std::string_view sharedPorts = "shared ports";
+constexpr std::string_view ownPorts = "own ports";
 /// In the order of Command.
 constexpr std::array<std::string_view, 3> commandNames{"start", "pause", "stop"};
 
@@ -96,6 +103,25 @@ std::vector<std::string> splitFields(const std::string& message) {
     return fields;
 }
 
+std::string encodeAnswer(const Result<SessionCount>& done) {
+    if (!done) {
+        return std::string(failure) + done.error().message;
+    }
+    return std::string(success) + std::to_string(done->ended) + " " + std::to_string(done->kept);
+}
+
+/// A supervisor of another version may say no more than "ok".
+Result<SessionCount> decodeAnswer(const std::string& answer) {
+    if (answer.starts_with(failure)) {
+        return Error(answer.substr(failure.size()));
+    }
+    SessionCount count;
+    if (answer.starts_with(success)) {
+        std::istringstream(answer.substr(success.size())) >> count.ended >> count.kept;
+    }
+    return count;
+}
+
 } // namespace
 
 std::string encodeRequest(const ControlRequest& request) {
@@ -104,6 +130,8 @@ std::string encodeRequest(const ControlRequest& request) {
     add(commandNames.at(static_cast<std::size_t>(request.command)));
     if (request.command == Command::start) {
         add(request.order.configurationHash);
+        add(request.endSessions ? endSessions : keepSessions);
+        add(request.order.sharesPorts ? sharedPorts : ownPorts);
         add(std::to_string(request.order.ports.size()));
         for (const int port : request.order.ports) {
             add(std::to_string(port));
@@ -116,7 +144,7 @@ std::string encodeRequest(const ControlRequest& request) {
 }
 
 Result<ControlRequest> decodeRequest(const std::string& message) {
-    const Error malformed("unknown request");
+    const Error malformed(unknownRequest);
     const std::vector<std::string> fields = splitFields(message);
     const auto* const known = std::ranges::find(commandNames, fields.empty() ? "" : fields[0]);
     if (known == commandNames.end()) {
@@ -129,13 +157,15 @@ Result<ControlRequest> decodeRequest(const std::string& message) {
     const auto number = [&fields](std::size_t index) {
         return static_cast<int>(index < fields.size() ? parseNumber(fields[index]).value_or(-1) : -1);
     };
-    constexpr std::size_t firstPort = 3;
-    const int portCount = number(2);
+    constexpr std::size_t firstPort = 5;
+    const int portCount = number(4);
     if (portCount < 0 || fields.size() <= firstPort + static_cast<std::size_t>(portCount)) {
         return malformed;
     }
     const std::size_t firstArgument = firstPort + static_cast<std::size_t>(portCount);
     request.order.configurationHash = fields[1];
+    request.endSessions = fields[2] == endSessions;
+    request.order.sharesPorts = fields[3] == sharedPorts;
     for (std::size_t index = firstPort; index < firstArgument; ++index) {
         request.order.ports.push_back(number(index));
     }
@@ -165,7 +195,7 @@ ControlListener::~ControlListener() {
     }
 }
 
-void ControlListener::serve(const std::function<Result<>(const ControlRequest&)>& handle) {
+void ControlListener::serve(const std::function<Result<SessionCount>(const ControlRequest&)>& handle) {
     const UniqueFd peer(::accept4(descriptor(), nullptr, nullptr, SOCK_CLOEXEC));
     if (!peer || !maySpeak(peer.get())) {
         return;
@@ -175,13 +205,14 @@ void ControlListener::serve(const std::function<Result<>(const ControlRequest&)>
     limitSending(peer.get(), limit);
     const auto message = receiveMessage(peer.get(), Clock::now() + limit);
     const auto request = decodeRequest(message.value_or(""));
-    const Result<> done = request ? handle(*request) : request.error();
-    const std::string answer = done ? "ok" : std::string(failure) + done.error().message;
+    const std::string answer =
+        encodeAnswer(request ? handle(*request) : Result<SessionCount>(request.error()));
     ::send(peer.get(), answer.data(), answer.size(), MSG_NOSIGNAL);
 }
 
-std::optional<Result<>> askSupervisor(const std::filesystem::path& folder, const std::string& daemon,
-                                      const ControlRequest& request, std::chrono::milliseconds limit) {
+std::optional<Result<SessionCount>> askSupervisor(const std::filesystem::path& folder,
+                                                  const std::string& daemon, const ControlRequest& request,
+                                                  std::chrono::milliseconds limit) {
     const SocketAddress address(folder, daemon);
     const UniqueFd socket(::socket(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0));
     const Clock::time_point deadline = Clock::now() + limit;
@@ -196,7 +227,7 @@ std::optional<Result<>> askSupervisor(const std::filesystem::path& folder, const
     if (!answer) {
         return std::nullopt;
     }
-    return answer->starts_with(failure) ? Error(answer->substr(failure.size())) : Result<>();
+    return decodeAnswer(*answer);
 }
 
 } // namespace velt

@@ -15,14 +15,15 @@
 namespace velt {
 
 enum class Command {
-    start, ///< make this order run; the answer comes when it does or cannot
+    start, ///< make this order run; the answer comes when it does or cannot, and what ran then runs on
     pause, ///< end the listener only
     stop,  ///< end the listener and its sessions; the supervisor ends as well
 };
 
 struct ControlRequest {
     Command command = Command::stop;
-    DaemonOrder order; ///< for a start
+    DaemonOrder order;        ///< for a start
+    bool endSessions = false; ///< for a start: those that others left end; else they go on
 };
 
 /// A request as one message, and back. Fails when the message does not have this form.
@@ -41,7 +42,7 @@ public:
     int descriptor() const { return socket_.get(); }
 
     /// Takes one request and answers with what `handle` returns for it.
-    void serve(const std::function<Result<>(const ControlRequest&)>& handle);
+    void serve(const std::function<Result<SessionCount>(const ControlRequest&)>& handle);
 
 private:
     ControlListener(const std::filesystem::path& folder, const std::string& daemon);
@@ -54,8 +55,12 @@ private:
 /// Sends the request to the daemon's supervisor, and returns its answer; nothing when no supervisor answers
 /// in time. The error's message is a phrase, as everywhere in this folder: it continues "The FTP daemon does
 /// not start: ".
-std::optional<Result<>> askSupervisor(const std::filesystem::path& folder, const std::string& daemon,
-                                      const ControlRequest& request, std::chrono::milliseconds limit);
+std::optional<Result<SessionCount>> askSupervisor(const std::filesystem::path& folder,
+                                                  const std::string& daemon, const ControlRequest& request,
+                                                  std::chrono::milliseconds limit);
+
+/// The error's message of a supervisor that does not know the request: one of another version.
+inline constexpr const char* unknownRequest = "unknown request";
 
 } // namespace velt
 

@@ -1,10 +1,10 @@
 #include "standalone/supervise/daemon_process.h"
 
-#include "base/spawning.h"
 #include "base/text.h"
 #include "standalone/ports/port_range.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/listening_sockets.h"
+#include "standalone/supervise/announced_start.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -40,26 +40,23 @@ DaemonProcess::DaemonProcess(Listener listener) : listener_(std::move(listener))
     }
 }
 
-Result<> DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadline) {
+Result<> DaemonProcess::start(const DaemonOrder& order, Clock::time_point deadline,
+                              const std::function<Result<>()>& announce) {
     readOutput(); // what a former daemon left says nothing about this one
     lastLines_.clear();
     partialLine_.clear();
     serves_ = false;
-    VELT_RETURN_IF_ERROR(spawn(order));
+    VELT_RETURN_IF_ERROR(spawn(order, announce));
     auto started = waitUntilListening(order, deadline);
     serves_ = bool(started);
     return started;
 }
 
-Result<> DaemonProcess::spawn(const DaemonOrder& order) {
+Result<> DaemonProcess::spawn(const DaemonOrder& order, const std::function<Result<>()>& announce) {
     if (order.arguments.empty()) {
         return Error("there is no program to start");
     }
-    Spawn program;
-    program.open("/dev/null", O_RDONLY, STDIN_FILENO);
-    program.pass(output_.writeEnd.get(), STDOUT_FILENO);
-    program.pass(output_.writeEnd.get(), STDERR_FILENO);
-    VELT_ASSIGN_OR_RETURN(const auto pid, program.start(order.arguments));
+    VELT_ASSIGN_OR_RETURN(const auto pid, startAnnounced(order.arguments, output_.writeEnd.get(), announce));
     // A child that has ended already cannot be identified any more, but keeps its pid until it is reaped.
     id_ = identifyProcess(pid).value_or(ProcessId{pid, 0});
     siginfo_t ended{};
@@ -124,6 +121,7 @@ void DaemonProcess::readOutput() {
     for (int left = messagesAtOnce; left > 0; --left) {
         const ssize_t length = ::read(output_.readEnd.get(), buffer.data(), buffer.size());
         if (length <= 0) {
+            silent_ = length == 0;
             return;
         }
         const std::string_view message(buffer.data(), static_cast<std::size_t>(length));

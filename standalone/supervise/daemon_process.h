@@ -27,10 +27,12 @@ public:
     /// Opens the pipe for what the daemon and its sessions write to their standard output and error.
     explicit DaemonProcess(Listener listener = {});
 
-    /// Starts the daemon and waits until it listens. On failure the daemon is gone, and the error is its own
-    /// last words where it has some. What it writes goes to syslog, but no more than 600 lines a minute,
-    /// since strangers can make it write; a line tells how many are missing.
-    Result<> start(const DaemonOrder& order, Clock::time_point deadline);
+    /// Starts the daemon and waits until it listens. Before the daemon does anything, `announce` is called,
+    /// so that it can be written down as one of this process's. On failure the daemon is gone, and the error
+    /// is its own last words where it has some. What it writes goes to syslog, but no more than 600 lines a
+    /// minute, since strangers can make it write; a line tells how many are missing.
+    Result<> start(const DaemonOrder& order, Clock::time_point deadline,
+                   const std::function<Result<>()>& announce);
 
     /// The running daemon; no process before a start and after ended().
     const ProcessId& id() const { return id_; }
@@ -38,20 +40,28 @@ public:
     /// To be told when the daemon was reaped with this status; returns why it ended.
     Error ended(int waitStatus);
 
+    /// To be called when it has a successor: no daemon is started here again. What its sessions say is still
+    /// read.
+    void retire() { output_.writeEnd.reset(); }
+
+    /// After retire(): whether the last of them has ended.
+    bool isSilent() const { return silent_; }
+
     /// Becomes readable when the daemon has written something, which readOutput() then takes, as far as it is
     /// there.
     int outputDescriptor() const { return output_.readEnd.get(); }
     void readOutput();
 
 private:
-    Result<> spawn(const DaemonOrder& order);
+    Result<> spawn(const DaemonOrder& order, const std::function<Result<>()>& announce);
     Result<> waitUntilListening(const DaemonOrder& order, Clock::time_point deadline);
     std::string takeLastWords();
     void takeLine(std::string line);
     void log(const std::string& line);
 
     Listener listener_;
-    Pipe output_; ///< with its write end, so that the read end never sees an end of file
+    Pipe output_; ///< with its write end, so that the read end sees no end of file before retire()
+    bool silent_ = false;
     ProcessId id_;
     std::string partialLine_;
     bool serves_ = false; ///< what it says may contain what its clients say

@@ -11,6 +11,7 @@
 #include <fstream>
 #include <sstream>
 #include <string_view>
+#include <utility>
 
 namespace velt {
 namespace {
@@ -153,13 +154,7 @@ bool isServing(const DaemonState& state) {
 bool endLeftovers(const DaemonState& state) {
     std::vector<ProcessId> known = state.sessions;
     known.push_back(state.daemon);
-    const auto remaining = [&known] {
-        // What was once seen below the daemon stays known when the daemon ends first.
-        std::vector<ProcessId> living = livingTrees(known);
-        known = living;
-        return living;
-    };
-    return endProcesses(remaining, std::chrono::seconds(1));
+    return endTrees(std::move(known), std::chrono::seconds(1));
 }
 
 } // namespace velt

@@ -3,9 +3,10 @@
 //     velt-supervise FOLDER DAEMON CONFIGURATION PORTS PROGRAM [ARGUMENT...]
 //     velt-supervise FOLDER DAEMON
 //
-// FOLDER holds the state file, the lock and the control socket of DAEMON; PORTS are separated by commas;
-// CONFIGURATION identifies what the daemon is started for. The process that was started ends at once; its
-// child goes on and writes "ready", or "failed" and the reason, to descriptor 3.
+// FOLDER holds the state file, the lock and the control socket of DAEMON; PORTS are separated by commas, with
+// "shared" before them where a successor can have them at the same time; CONFIGURATION identifies what the
+// daemon is started for. The process that was started ends at once; its child goes on and writes "ready", or
+// "failed" and the reason, to descriptor 3.
 //
 // In the second form it is a service manager's: it stays in the foreground, finds what to start in
 // FOLDER's order file, and says how that went as sd_notify(3) describes it.
@@ -121,13 +122,16 @@ int superviseForManager(const std::string& folder, const std::string& daemon) {
 }
 
 int superviseDetached(int argc, char** argv) {
-    const auto ports = parsePorts(argv[4]);
+    std::string_view portText = argv[4];
+    const bool shared = portText.starts_with(velt::sharedPortsPrefix);
+    portText.remove_prefix(shared ? velt::sharedPortsPrefix.size() : 0);
+    const auto ports = parsePorts(portText);
     if (!ports) {
         std::fprintf(stderr, "velt-supervise: PORTS: expected numbers from 1 to 65535, not \"%s\"\n",
                      argv[4]);
         return 2;
     }
-    const DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}};
+    const DaemonOrder order{argv[3], *ports, {argv + 5, argv + argc}, shared};
     detach();
     return supervise(argv[1], argv[2], order, reportToCaller);
 }

@@ -12,10 +12,10 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <csignal>
 #include <cstring>
+#include <iterator>
 #include <utility>
 
 namespace velt {
@@ -25,7 +25,8 @@ using std::chrono::milliseconds;
 
 // A caller waits five seconds for a start, and needs a little of that for itself.
 constexpr milliseconds startLimit{4700};
-constexpr milliseconds patience{2000}; ///< between SIGTERM and SIGKILL
+constexpr milliseconds patience{2000};   ///< between SIGTERM and SIGKILL
+constexpr milliseconds returnLimit{700}; ///< for a daemon that served a moment ago
 
 UniqueFd openSignals() {
     sigset_t wanted;
@@ -52,10 +53,20 @@ std::string statusLine(const DaemonState& state) {
     return "STATUS=";
 }
 
+bool haveCommonPort(const DaemonOrder& one, const DaemonOrder& other) {
+    return std::ranges::any_of(
+        one.ports, [&](int port) { return std::ranges::find(other.ports, port) != other.ports.end(); });
+}
+
+void remove(std::vector<ProcessId>& processes, const ProcessId& process) {
+    std::erase(processes, process);
+}
+
 } // namespace
 
 Supervisor::Supervisor(std::filesystem::path folder, std::string name, DaemonProcess::Listener listener)
-    : folder_(std::move(folder)), name_(std::move(name)), daemon_(std::move(listener)) {}
+    : folder_(std::move(folder)), name_(std::move(name)), listener_(std::move(listener)),
+      daemon_(std::make_unique<DaemonProcess>(listener_)) {}
 
 Result<> Supervisor::begin(const DaemonOrder& order) {
     const auto deadline = Clock::now() + startLimit;
@@ -96,7 +107,10 @@ Result<> Supervisor::takeLock() {
 
 Result<> Supervisor::startDaemon(Clock::time_point deadline) {
     restartAt_.reset();
-    auto started = daemon_.start(order_, deadline);
+    auto started = daemon_->start(order_, deadline, [this] {
+        record(RunState::failed, reason_.empty() ? "it is being started" : reason_);
+        return Result<>();
+    });
     startedAt_ = Clock::now();
     publish(started ? RunState::running : RunState::failed, started ? "" : started.error().message);
     return started;
@@ -104,18 +118,10 @@ Result<> Supervisor::startDaemon(Clock::time_point deadline) {
 
 void Supervisor::run() {
     while (!finished_) {
-        std::array<pollfd, 3> events{{{signals_.get(), POLLIN, 0},
-                                      {control_->descriptor(), POLLIN, 0},
-                                      {daemon_.outputDescriptor(), POLLIN, 0}}};
-        ::poll(events.data(), events.size(), millisecondsToRestart());
-        if (events[2].revents != 0) {
-            daemon_.readOutput();
-        }
-        if (events[0].revents != 0) {
-            onSignals();
-        }
-        if (events[1].revents != 0 && !finished_) {
-            control_->serve([this](const ControlRequest& request) { return handle(request); });
+        waitForEvents();
+        if (retirement_ && retirement_->proceed()) {
+            retirement_.reset();
+            record(state_, reason_);
         }
         if (restartAt_ && Clock::now() >= *restartAt_ && !finished_) {
             restartDaemon();
@@ -123,11 +129,32 @@ void Supervisor::run() {
     }
 }
 
-Result<> Supervisor::handle(const ControlRequest& request) {
+void Supervisor::waitForEvents() {
+    std::vector<pollfd> events{{signals_.get(), POLLIN, 0},
+                               {control_->descriptor(), POLLIN, 0},
+                               {daemon_->outputDescriptor(), POLLIN, 0}};
+    for (const auto& each : former_) {
+        events.push_back({each->outputDescriptor(), POLLIN, 0});
+    }
+    ::poll(events.data(), events.size(), millisecondsToNextTask());
+    if (events[2].revents != 0) {
+        daemon_->readOutput();
+    }
+    std::ranges::for_each(former_, [](const auto& each) { each->readOutput(); });
+    std::erase_if(former_, [](const auto& each) { return each->isSilent() && !each->id(); });
+    if (events[0].revents != 0) {
+        onSignals();
+    }
+    if (events[1].revents != 0 && !finished_) {
+        control_->serve([this](const ControlRequest& request) { return handle(request); });
+    }
+}
+
+Result<SessionCount> Supervisor::handle(const ControlRequest& request) {
     reapChildren(); // the daemon may have ended a moment ago
     switch (request.command) {
     case Command::start:
-        return replaceDaemon(request.order);
+        return follow(request.order, request.endSessions);
     case Command::pause:
         return pause();
     case Command::stop:
@@ -136,31 +163,103 @@ Result<> Supervisor::handle(const ControlRequest& request) {
     return Error("unknown command");
 }
 
-Result<> Supervisor::replaceDaemon(const DaemonOrder& order) {
+Result<SessionCount> Supervisor::follow(const DaemonOrder& order, bool endSessions) {
     const auto deadline = Clock::now() + startLimit;
     const bool unchanged =
-        state_ == RunState::running && daemon_.id() && order.configurationHash == order_.configurationHash;
-    if (unchanged) {
-        return {};
+        state_ == RunState::running && daemon_->id() && order.configurationHash == order_.configurationHash;
+    if (!unchanged) {
+        finishRetirement();
+        VELT_RETURN_IF_ERROR(canHandOver(order) ? handOver(order, deadline) : exchange(order, deadline));
     }
-    VELT_RETURN_IF_ERROR(endDaemon());
+    if (endSessions) {
+        finishRetirement();
+    }
+    std::vector<ProcessId> settled = sessions();
+    if (!unchanged) { // those of the new daemon began with the new settings
+        for (const ProcessId& fresh : childrenOf(daemon_->id().pid)) {
+            remove(settled, fresh);
+        }
+    }
+    return settleSessions(settled, endSessions);
+}
+
+bool Supervisor::canHandOver(const DaemonOrder& order) const {
+    const bool serves = state_ == RunState::running && daemon_->id();
+    return serves && (!haveCommonPort(order, order_) || (order.sharesPorts && order_.sharesPorts));
+}
+
+/// The former daemon ends when the new one listens, and not at all if that does not come up.
+Result<> Supervisor::handOver(const DaemonOrder& order, Clock::time_point deadline) {
+    auto successor = std::make_unique<DaemonProcess>(listener_);
+    auto started = successor->start(order, deadline, [this] {
+        record(state_, reason_);
+        return published_; // a daemon that nobody knows of could not be ended
+    });
+    if (!started) {
+        record(state_, reason_);
+        return started;
+    }
+    retirement_.emplace(daemon_->id(), successor->id(), order.ports);
+    daemon_->retire();
+    former_.push_back(std::move(daemon_));
+    daemon_ = std::move(successor);
     order_ = order;
+    startedAt_ = Clock::now();
+    backOff_.forget();
+    publish(RunState::running);
+    return {};
+}
+
+/// The former daemon ends first. It is started again if the new one does not come up.
+Result<> Supervisor::exchange(const DaemonOrder& order, Clock::time_point deadline) {
+    const bool served = state_ == RunState::running && daemon_->id();
+    VELT_RETURN_IF_ERROR(endDaemon());
+    const DaemonOrder former = std::exchange(order_, order);
     backOff_.forget();
     // A failed start is not tried again: the caller hears of it and decides.
-    return startDaemon(deadline);
-}
-
-Result<> Supervisor::pause() {
-    restartAt_.reset();
-    auto ended = endDaemon();
-    if (ended) {
-        publish(RunState::paused);
+    auto started = startDaemon(served ? deadline - returnLimit : deadline);
+    if (!started && served) {
+        order_ = former;
+        (void)startDaemon(Clock::now() + returnLimit);
     }
-    return ended;
+    return started;
 }
 
-Result<> Supervisor::stop() {
+/// One process each: what a daemon has started, or has left behind.
+std::vector<ProcessId> Supervisor::sessions() const {
+    std::vector<ProcessId> found = childrenOf(::getpid());
+    std::vector<ProcessId> daemons{daemon_->id()};
+    std::ranges::transform(former_, std::back_inserter(daemons), [](const auto& each) { return each->id(); });
+    for (const ProcessId& daemon : daemons) {
+        remove(found, daemon);
+        const auto own = daemon ? childrenOf(daemon.pid) : std::vector<ProcessId>();
+        found.insert(found.end(), own.begin(), own.end());
+    }
+    return found;
+}
+
+Result<SessionCount> Supervisor::settleSessions(const std::vector<ProcessId>& sessions, bool end) {
+    const int count = static_cast<int>(sessions.size());
+    if (!end) {
+        return SessionCount{0, count};
+    }
+    if (!endTrees(sessions, patience)) {
+        return Error("some of its sessions did not end");
+    }
+    return SessionCount{count, 0};
+}
+
+Result<SessionCount> Supervisor::pause() {
     restartAt_.reset();
+    finishRetirement();
+    VELT_RETURN_IF_ERROR(endDaemon());
+    publish(RunState::paused);
+    return settleSessions(sessions(), false);
+}
+
+Result<SessionCount> Supervisor::stop() {
+    restartAt_.reset();
+    const int count = static_cast<int>(sessions().size());
     const bool ended = endProcesses([] { return descendantsOf(::getpid()); }, patience);
     settleDaemon();
     if (!ended) {
@@ -168,11 +267,18 @@ Result<> Supervisor::stop() {
     }
     ::unlink(stateFile(folder_, name_).c_str());
     finished_ = true;
-    return {};
+    return SessionCount{count, 0};
+}
+
+void Supervisor::finishRetirement() {
+    if (retirement_) {
+        retirement_->finish();
+        retirement_.reset();
+    }
 }
 
 Result<> Supervisor::endDaemon() {
-    const ProcessId daemon = daemon_.id();
+    const ProcessId daemon = daemon_->id();
     if (!daemon) {
         return {};
     }
@@ -186,8 +292,8 @@ Result<> Supervisor::endDaemon() {
 /// Takes note of an end that was asked for, before reapChildren() sees it and has the daemon started again.
 void Supervisor::settleDaemon() {
     int status = 0;
-    if (daemon_.id() && ::waitpid(daemon_.id().pid, &status, WNOHANG) == daemon_.id().pid) {
-        daemon_.ended(status);
+    if (daemon_->id() && ::waitpid(daemon_->id().pid, &status, WNOHANG) == daemon_->id().pid) {
+        daemon_->ended(status);
     }
 }
 
@@ -208,14 +314,19 @@ void Supervisor::onSignals() {
 void Supervisor::reapChildren() {
     int status = 0;
     for (pid_t pid = ::waitpid(-1, &status, WNOHANG); pid > 0; pid = ::waitpid(-1, &status, WNOHANG)) {
-        if (pid == daemon_.id().pid) {
+        if (pid == daemon_->id().pid) {
             onDaemonEnd(status);
+        }
+        for (const auto& each : former_) {
+            if (pid == each->id().pid) {
+                each->ended(status);
+            }
         }
     }
 }
 
 void Supervisor::onDaemonEnd(int waitStatus) {
-    const std::string reason = daemon_.ended(waitStatus).message;
+    const std::string reason = daemon_->ended(waitStatus).message;
     ::syslog(LOG_ERR, "%s has ended and is started again: %s", name_.c_str(), reason.c_str());
     restartAfter(Clock::now() - startedAt_);
     publish(RunState::failed, reason);
@@ -233,33 +344,41 @@ void Supervisor::restartAfter(Clock::duration run) {
     restartAt_ = Clock::now() + backOff_.after(run);
 }
 
-int Supervisor::millisecondsToRestart() const {
-    if (!restartAt_) {
+int Supervisor::millisecondsToNextTask() const {
+    if (!restartAt_ && !retirement_) {
         return -1;
     }
-    const auto left = std::chrono::duration_cast<milliseconds>(*restartAt_ - Clock::now());
+    const auto never = Clock::time_point::max();
+    const auto next = std::min(restartAt_.value_or(never), retirement_ ? retirement_->nextLook() : never);
+    const auto left = std::chrono::duration_cast<milliseconds>(next - Clock::now());
     return static_cast<int>(std::max<milliseconds::rep>(left.count() + 1, 0));
 }
 
-void Supervisor::publish(RunState state, std::string reason) {
+/// To be called also before a daemon does anything: a later supervisor must find it.
+DaemonState Supervisor::record(RunState state, std::string reason) {
     state_ = state;
-    DaemonState record;
-    record.state = state;
+    reason_ = std::move(reason);
+    DaemonState now;
+    now.state = state;
     if (!finished_) { // a supervisor that is listed but not alive counts as killed
-        record.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+        now.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
     }
-    record.daemon = daemon_.id();
-    record.configurationHash = order_.configurationHash;
-    record.ports = order_.ports;
-    record.restarts = restarts_;
-    record.sessions = descendantsOf(::getpid());
-    std::erase(record.sessions, daemon_.id());
-    record.reason = std::move(reason);
-    tellServiceManager(statusLine(record));
-    published_ = storeDaemonState(stateFile(folder_, name_), record);
+    now.daemon = daemon_->id();
+    now.configurationHash = order_.configurationHash;
+    now.ports = order_.ports;
+    now.restarts = restarts_;
+    now.sessions = descendantsOf(::getpid());
+    std::erase(now.sessions, daemon_->id());
+    now.reason = reason_;
+    published_ = storeDaemonState(stateFile(folder_, name_), now);
     if (!published_) {
         ::syslog(LOG_ERR, "%s", published_.error().message.c_str());
     }
+    return now;
+}
+
+void Supervisor::publish(RunState state, std::string reason) {
+    tellServiceManager(statusLine(record(state, std::move(reason))));
 }
 
 } // namespace velt

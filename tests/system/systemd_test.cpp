@@ -15,6 +15,9 @@
 #include <csignal>
 #include <filesystem>
 #include <fstream>
+#include <string>
+#include <thread>
+#include <vector>
 
 namespace velt::test {
 namespace {
@@ -69,6 +72,41 @@ TEST_F(UnderSystemd, manyChangesInARowAreNoCrashes) {
             ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
         }
         EXPECT_EQ(fetchByFtp("/home-of", 2128), "alice");
+    });
+}
+
+TEST_F(UnderSystemd, aChangeHandsThePortOverAndKeepsTheSessions) {
+    inside([] {
+        openMachine();
+        storeFtp(plain, 2121);
+        ASSERT_EQ(VLIBServiceStart("ftpd", 0), 0) << lastErrorSentence();
+        std::ofstream("/home/alice/large") << std::string(20000000, 'x');
+        std::string size;
+        std::thread client([&size] {
+            size = runProcess({"curl", "-sS", "--limit-rate", "5M", "-o", "/dev/null", "-w",
+                               "%{size_download}", "-u", "alice:alice-secret", "ftp://127.0.0.1:2121/large"},
+                              {}, std::chrono::seconds(20))
+                       .output;
+        });
+        const ProcessId former = serviceState("ftpd").daemon;
+        EXPECT_TRUE(waitUntil([&] { return !childrenOf(former.pid).empty(); }, std::chrono::seconds(5)));
+        std::this_thread::sleep_for(milliseconds(500));
+        ServiceRequest request(SessionPolicy::keep);
+        storeFtp(plain, 2121, false);
+        ASSERT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+        ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+        EXPECT_EQ(request.finish().valueOr({}), (std::vector<ServiceSessions>{{"ftp", 0, 1}}));
+        EXPECT_NE(serviceState("ftpd").daemon, former);
+        EXPECT_TRUE(isAlive(former)) << "it was not let look at its sockets, and ended at once";
+        client.join();
+        EXPECT_EQ(size, "20000000");
+        EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, std::chrono::seconds(5)));
+        // A supervisor that is killed is started again for the settings of now.
+        const std::string hash = serviceState("ftpd").configurationHash;
+        const ProcessId successor = serviceState("ftpd").daemon;
+        signalProcess(serviceState("ftpd").supervisor, SIGKILL);
+        ASSERT_TRUE(isBack("ftpd", successor));
+        EXPECT_EQ(serviceState("ftpd").configurationHash, hash);
     });
 }
 

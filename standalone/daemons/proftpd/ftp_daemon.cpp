@@ -1,6 +1,7 @@
 // The FTP daemon's row: ProFTPD, one process for FTP and FTPS.
 #include "standalone/daemons/daemon.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/daemons/proftpd/session_rights.h"
 #include "standalone/ports/port_range.h"
 
 #include <array>
@@ -41,6 +42,7 @@ const Daemon ftpDaemon{
     .serviceNames = serviceNames,
     .settings = loadSettings,
     .plan = planFtpDaemon,
+    .takesRights = takesFtpRights,
     .test = testStored,
 };
 

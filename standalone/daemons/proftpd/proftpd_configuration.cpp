@@ -90,6 +90,9 @@ void renderAddresses(Text& text, const FtpSettings& settings, const ProftpdPlace
     text.line("DefaultAddress", ipv6 ? "::" : places.loopbackOnly ? "127.0.0.1" : "0.0.0.0");
     text.line("SocketBindTight on");
     text.line("Port", controlPort(record));
+    // So a daemon with other settings listens before this one ends. Of a session's own sockets, with which
+    // two could take the same data port, mod_velt_login takes it back.
+    text.line("SocketOptions reuseport on");
     // The firewall opens this range and no other, so it is never left to the kernel.
     const VELT_FTP_PORT_RANGE passive = passiveRange(record);
     text.line("PassivePorts", passive.first, passive.last);

@@ -6,9 +6,14 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/proftpd/proftpd_surroundings.h"
+#include "standalone/daemons/proftpd/session_rights.h"
+#include "standalone/daemons/tested_configurations.h"
 #include "standalone/rules/rule_store.h"
 
 #include <sys/stat.h>
+
+#include <utility>
+#include <vector>
 
 namespace velt {
 namespace {
@@ -22,7 +27,7 @@ Result<> makeDaemonFolder(const ProftpdPlaces& places) {
 }
 
 // The same text, but for the files that the daemon would write: its test writes some of them, too.
-Result<> testRendering(const FtpSettings& settings, ProftpdPlaces places) {
+Result<> runTest(const FtpSettings& settings, ProftpdPlaces places) {
     VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
     places.runFolder = scratch.path();
     VELT_RETURN_IF_ERROR(makeDaemonFolder(places));
@@ -41,14 +46,28 @@ bool confinesAnonymous(const FtpSettings& settings) {
     return settings.record.anonymous != 0 && settings.record.anonymous_chroot != 0;
 }
 
+/// The files beside the configuration of which a daemon is made.
+std::vector<std::filesystem::path> filesOf(const ProftpdPlaces& places) {
+    return {program, places.moduleFolder / "mod_velt_login.so", "/usr/lib/proftpd/mod_tls.so"};
+}
+
 /// Stands for all that a daemon reads at its start and nowhere else.
 std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
     std::string all = renderProftpd(settings, found.places);
     const std::string share = confinesAnonymous(settings) ? settings.record.anonymous_chroot_share : "";
-    for (const std::string& part : {share, found.certificateFingerprint}) {
+    for (const std::string& part : {share, found.certificateFingerprint, identityOf(filesOf(found.places))}) {
         all += '\0' + part;
     }
     return sha256(all);
+}
+
+Result<> testRendering(const FtpSettings& settings, const FtpSurroundings& found) {
+    std::vector<std::filesystem::path> accounts; // which the daemon reads at each login, and its test now
+    if (const auto& files = found.places.accountFiles) {
+        accounts = {files->users, files->groups};
+    }
+    return testOnce(hashOf(settings, found) + identityOf(accounts),
+                    [&] { return runTest(settings, found.places); });
 }
 
 Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
@@ -69,16 +88,18 @@ Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found)
     VELT_RETURN_IF_ERROR(writeSurroundings(settings, found.places));
     const auto configuration = folder / "proftpd.conf";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, renderProftpd(settings, found.places), 0600));
+    VELT_RETURN_IF_ERROR(storePlanSettings(folder, settings));
     // In the foreground, and with "-q" left out: the reason of a failed start then comes on standard error.
-    return DaemonPlan{{hash, {controlPort(settings.record)}, {program, "-n", "-c", configuration.string()}},
-                      folder};
+    DaemonOrder order{
+        hash, {controlPort(settings.record)}, {program, "-n", "-c", configuration.string()}, true};
+    return DaemonPlan{std::move(order), folder};
 }
 
 } // namespace
 
 Result<> testFtpCandidate(const FtpSettings& settings) {
     VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
-    return testRendering(settings, found.places);
+    return testRendering(settings, found);
 }
 
 Result<std::optional<DaemonPlan>> planFtpDaemon() {
@@ -89,7 +110,7 @@ Result<std::optional<DaemonPlan>> planFtpDaemon() {
     }
     VELT_RETURN_IF_ERROR(checkFtpSettings(settings));
     VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
-    VELT_RETURN_IF_ERROR(testRendering(settings, found.places));
+    VELT_RETURN_IF_ERROR(testRendering(settings, found));
     VELT_ASSIGN_OR_RETURN(auto plan, writePlan(settings, found));
     return plan;
 }

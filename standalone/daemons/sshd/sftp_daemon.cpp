@@ -37,6 +37,7 @@ const Daemon sftpDaemon{
     .dropIns = dropIns,
     .settings = loadSettings,
     .plan = planSftpDaemon,
+    .takesRights = [](const auto&, const auto&) { return false; }, // its settings are its port, on and off
     .test = testStored,
 };
 

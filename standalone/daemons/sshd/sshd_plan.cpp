@@ -12,6 +12,7 @@
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/sshd/host_keys.h"
 #include "standalone/daemons/sshd/sshd_configuration.h"
+#include "standalone/daemons/tested_configurations.h"
 #include "standalone/settings/settings.h"
 
 #include <sys/stat.h>
@@ -19,6 +20,7 @@
 
 #include <cerrno>
 #include <cstring>
+#include <vector>
 
 namespace velt {
 namespace {
@@ -65,18 +67,29 @@ Result<Rendering> render(const SftpSettings& settings) {
     return Rendering{std::move(text), std::move(keys)};
 }
 
-Result<> testRendering(const std::string& text) {
+Result<> runTest(const std::string& text) {
     VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
     const auto configuration = scratch.path() / "sshd_config";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, text, 0600));
     return runConfigurationTest("SFTP", {program, "-t", "-f", configuration.string()});
 }
 
+/// Stands for all that the daemon reads at its start.
+std::string hashOf(const Rendering& rendering) {
+    std::vector<std::filesystem::path> files = rendering.keys.files;
+    files.emplace_back(program);
+    return sha256(rendering.text + '\0' + identityOf(files));
+}
+
+Result<> testRendering(const Rendering& rendering) {
+    return testOnce(hashOf(rendering), [&] { return runTest(rendering.text); });
+}
+
 } // namespace
 
 Result<> testSftpCandidate(const SftpSettings& settings) {
     VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
-    return testRendering(rendering.text);
+    return testRendering(rendering);
 }
 
 Result<std::optional<DaemonPlan>> planSftpDaemon() {
@@ -84,8 +97,8 @@ Result<std::optional<DaemonPlan>> planSftpDaemon() {
     VELT_ASSIGN_OR_RETURN(const auto settings, loadSftpSettings());
     VELT_RETURN_IF_ERROR(checkSftpSettings(settings));
     VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
-    VELT_RETURN_IF_ERROR(testRendering(rendering.text));
-    const std::string hash = sha256(rendering.text);
+    VELT_RETURN_IF_ERROR(testRendering(rendering));
+    const std::string hash = hashOf(rendering);
     const auto folder = statePath(paths::sftpConfigurations) / hash;
     const auto configuration = folder / "sshd_config";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, rendering.text, 0600));

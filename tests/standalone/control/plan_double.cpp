@@ -2,6 +2,7 @@
 
 #include "standalone/core/error_number.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/daemons/proftpd/session_rights.h"
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/settings/settings.h"
 #include "tests/standalone/supervise/daemon_test.h"
@@ -73,6 +74,10 @@ Result<std::optional<DaemonPlan>> planSftpDaemon() {
         return settings.error();
     }
     return test::makePlan(settings->port, std::to_string(settings->port), test::planDouble().sftpOptions);
+}
+
+bool takesFtpRights(const std::filesystem::path&, const std::filesystem::path&) {
+    return test::planDouble().takesRights;
 }
 
 Result<> testFtpCandidate(const FtpSettings&) {

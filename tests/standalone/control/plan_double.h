@@ -9,6 +9,7 @@ namespace velt::test {
 
 /// How the next plans are made; the ports and the rest follow from the stored settings.
 struct PlanDouble {
+    bool takesRights = false;             ///< as if each change of the FTP settings took rights away
     bool refuse = false;                  ///< as if the daemon's own test had refused the configuration
     std::vector<std::string> ftpOptions;  ///< further arguments of the FTP daemon
     std::vector<std::string> sftpOptions; ///< of the SFTP daemon

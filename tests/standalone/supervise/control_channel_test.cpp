@@ -24,13 +24,13 @@ protected:
     }
 
     /// Asks for a pause as another user; what comes back.
-    std::optional<Result<>> askAs(uid_t uid) {
+    std::optional<Result<SessionCount>> askAs(uid_t uid) {
         // Whoever could get at the socket, by a mistake of an administrator's.
         chmod(folder_.path().c_str(), 0755);
         for (const auto& file : std::filesystem::directory_iterator(folder_.path())) {
             chmod(file.path().c_str(), 0777);
         }
-        std::optional<Result<>> answer;
+        std::optional<Result<SessionCount>> answer;
         // The system call, unlike the library's function, changes this thread alone.
         std::thread asking([&] {
             syscall(SYS_setresuid, uid, uid, uid);
@@ -38,7 +38,7 @@ protected:
         });
         listener_->serve([this](const ControlRequest& request) {
             commands_.push_back(request.command);
-            return Result<>();
+            return Result<SessionCount>(SessionCount{1, 2});
         });
         asking.join();
         return answer;
@@ -53,6 +53,7 @@ TEST_F(ControlChannel, obeysItsOwnUser) {
     const auto answer = askAs(geteuid());
     ASSERT_TRUE(answer);
     EXPECT_EQ(messageOf(*answer), "");
+    EXPECT_EQ(**answer, (SessionCount{1, 2}));
     EXPECT_EQ(commands_, std::vector<Command>{Command::pause});
 }
 

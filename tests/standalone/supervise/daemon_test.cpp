@@ -10,6 +10,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <csignal>
 #include <cstdlib>
 
@@ -73,6 +74,7 @@ Listener::~Listener() {
 DaemonOrder testOrder(int port, const std::string& hash, const std::vector<std::string>& options) {
     DaemonOrder order{hash, {port}, {VELT_TEST_DAEMON, "--port", std::to_string(port)}};
     order.arguments.insert(order.arguments.end(), options.begin(), options.end());
+    order.sharesPorts = std::ranges::find(options, "--share") != options.end();
     return order;
 }
 

@@ -104,7 +104,9 @@ TEST_F(SupervisorTest, ADaemonThatNeverListensFailsWithinFiveSeconds) {
     const std::string refusal = messageOf(sftp_.start(testOrder(port_, "two", {"--delay", "60000"})));
     EXPECT_LT(Clock::now() - began, promised);
     EXPECT_NE(refusal.find("did not listen on port " + std::to_string(port_)), std::string::npos) << refusal;
-    EXPECT_LE(leftProcesses().size(), 1U) << "there may be the supervisor, but neither daemon";
+    EXPECT_EQ(daemonState(sftpDaemon).configurationHash, "one") << "the former one serves again";
+    EXPECT_TRUE(isServing(daemonState(sftpDaemon)));
+    EXPECT_EQ(leftProcesses().size(), 2U) << "the supervisor and one daemon";
 }
 
 TEST_F(SupervisorTest, AProgramThatIsNotThereIsNamed) {

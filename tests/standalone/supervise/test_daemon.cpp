@@ -1,15 +1,15 @@
 // A daemon that behaves as its arguments say: what the supervisor is tried on.
 //
 //     velt-test-daemon [--port N]... [--delay MS] [--refuse WORDS] [--end-if FILE] [--say WORDS]...
-//     [--stubborn] [--any]
+//     [--stubborn] [--any] [--share]
 //
 // It ends by itself when there is a FILE, before or after it listens.
 //
 // It says the WORDS, each at once, before it listens.
 //
-// It listens on loopback, with --any on all addresses; each connection is served by a session in a process
-// and a terminal session of its own, which answers every byte with the same byte and ends with its
-// connection, or with a SIGTERM.
+// It listens on loopback, with --any on all addresses, with --share beside others that share the port; each
+// connection is served by a session in a process and a terminal session of its own, which answers every byte
+// with the same byte and ends with its connection, or with a SIGTERM.
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
@@ -36,6 +36,7 @@ struct Options {
     std::string sessionMessage; ///< at the beginning of each session
     bool stubborn = false;
     bool any = false;
+    bool share = false;
 };
 
 int number(const char* text) {
@@ -52,6 +53,10 @@ Options parse(int argc, char** argv) {
         }
         if (name == "--any") {
             options.any = true;
+            continue;
+        }
+        if (name == "--share") {
+            options.share = true;
             continue;
         }
         const char* value = index + 1 < argc ? argv[++index] : "";
@@ -72,13 +77,16 @@ Options parse(int argc, char** argv) {
     return options;
 }
 
-int listenOn(int port, bool any) {
+int listenOn(int port, const Options& options) {
     const int descriptor = ::socket(AF_INET, SOCK_STREAM, 0);
     const int on = 1;
     ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    if (options.share) {
+        ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEPORT, &on, sizeof on);
+    }
     sockaddr_in address{};
     address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(any ? INADDR_ANY : INADDR_LOOPBACK);
+    address.sin_addr.s_addr = htonl(options.any ? INADDR_ANY : INADDR_LOOPBACK);
     address.sin_port = htons(static_cast<in_port_t>(port));
     if (::bind(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0 ||
         ::listen(descriptor, 16) != 0) {
@@ -148,7 +156,7 @@ int main(int argc, char** argv) {
     }
     std::vector<int> listeners;
     for (const int port : options.ports) {
-        listeners.push_back(listenOn(port, options.any));
+        listeners.push_back(listenOn(port, options));
     }
     while (listeners.empty()) {
         ::pause();
