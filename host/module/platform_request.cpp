@@ -17,8 +17,10 @@ PlatformRequest::~PlatformRequest() {
 }
 
 PlatformReport PlatformRequest::finish() {
+    const auto sessions = services_.finish(); // may still stop a service, which is reported like the rest
     setEffectReport({});
-    report_.sentence = lastErrorSentence();
+    report_.sessions = sessions.valueOr({});
+    report_.sentence = sessions ? lastErrorSentence() : sessions.error().message;
     report_.conflict = lastPortConflict();
     return std::move(report_);
 }

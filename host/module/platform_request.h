@@ -10,12 +10,13 @@
 namespace velt::host {
 
 struct PlatformReport {
-    bool changed = false;             ///< something was stored, started or stopped
-    bool stored = false;              ///< something was stored
-    bool storeFailed = false;         ///< something could not be stored
-    std::vector<std::string> started; ///< the services that were started
-    std::string sentence;             ///< of the last error; "" when there was none
-    PortConflict conflict;            ///< the port that was found taken
+    bool changed = false;                  ///< something was stored, started or stopped
+    bool stored = false;                   ///< something was stored
+    bool storeFailed = false;              ///< something could not be stored
+    std::vector<std::string> started;      ///< the services that were started
+    std::string sentence;                  ///< of the last error; "" when there was none
+    PortConflict conflict;                 ///< the port that was found taken
+    std::vector<ServiceSessions> sessions; ///< of the services that were replaced or stopped
 };
 
 /// The request that this thread serves, from its construction to finish(). Stays on its thread.
@@ -33,6 +34,7 @@ private:
     void note(Effect effect, std::string_view subject, bool done);
 
     PlatformReport report_;
+    ServiceRequest services_;
 };
 
 } // namespace velt::host

@@ -91,6 +91,15 @@ void FakeStandalone::announce(const std::string& service, const std::string& act
 
 namespace velt {
 
+ServiceRequest::ServiceRequest(SessionPolicy) {}
+
+ServiceRequest::~ServiceRequest() = default;
+
+Result<std::vector<ServiceSessions>> ServiceRequest::finish() {
+    open_ = false;
+    return FakeStandalone::instance().sessions;
+}
+
 Result<> startEnabledServices() {
     FakeStandalone& fake = FakeStandalone::instance();
     ++fake.starts;

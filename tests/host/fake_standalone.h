@@ -24,11 +24,12 @@ struct FakeStandalone {
     bool startHelps = false;             ///< and run once they are started
     int starts = 0;                      ///< how often the host started what is switched on
     std::map<std::string, std::uint64_t> restarts;
-    velt::Findings findings;           ///< of the judgements to come
-    int judgements = 0;                ///< how many were made
-    std::function<void()> whileJudged; ///< called by each
-    int watchHolds = 0;                ///< how many hold the watch of the services back now
-    int watchHeld = 0;                 ///< and how often that was done
+    velt::Findings findings;                     ///< of the judgements to come
+    int judgements = 0;                          ///< how many were made
+    std::function<void()> whileJudged;           ///< called by each
+    int watchHolds = 0;                          ///< how many hold the watch of the services back now
+    int watchHeld = 0;                           ///< and how often that was done
+    std::vector<velt::ServiceSessions> sessions; ///< what each request did to them
     std::vector<velt::Ban> bans;
     bool bansFail = false;                 ///< with `sentence`
     std::vector<std::string> failedLogins; ///< "SERVICE ADDRESS"
