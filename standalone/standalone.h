@@ -16,6 +16,8 @@
 
 // The frame of a request: what it makes of stops and starts, and which sessions end.
 #include "standalone/control/service_request.h"
+// Changing the settings as a whole: preview, all or nothing.
+#include "standalone/change/settings_change.h"
 
 // Which services there are, which are down, and who holds a port.
 #include "standalone/contract/last_port_conflict.h"
@@ -26,6 +28,7 @@
 
 // On whose behalf, what happened, and what was written down.
 #include "standalone/journal/admin_log.h"
+#include "standalone/journal/change_history.h"
 #include "standalone/journal/request_actor.h"
 #include "standalone/journal/subscriptions.h"
 

@@ -7,6 +7,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/paths.h"
+#include "standalone/core/staged_files.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_store.h"
@@ -43,8 +44,10 @@ bool isBlank(std::string_view text) {
 
 Result<> writeSystemInformation(std::string_view key, std::string_view value) {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    return perform(Effect::store, "system information",
-                   [&] { return writeKeyValue(statePath(paths::systemInformation), key, value); });
+    return perform(Effect::store, "system information", [&]() -> Result<> {
+        VELT_ASSIGN_OR_RETURN(const auto file, storePath(paths::systemInformation));
+        return writeKeyValue(file, key, value);
+    });
 }
 
 } // namespace

@@ -7,7 +7,7 @@
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/paths.h"
-#include "standalone/core/state_root.h"
+#include "standalone/core/staged_files.h"
 
 #include <functional>
 #include <string>
@@ -40,7 +40,7 @@ int setRunKey(const char* service, int value) {
         if (value != keyAfterStart && value != keyAfterStop) {
             return Error(ErrorNumber::invalid, "Run key " + std::to_string(value) + ": expected 1 or 2.");
         }
-        const auto file = statePath(paths::runKeys) / service;
+        VELT_ASSIGN_OR_RETURN(const auto file, storePath(std::string(paths::runKeys) + '/' + service));
         return replaceFile(file, std::to_string(value) + "\n", 0644);
     });
 }

@@ -3,8 +3,8 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/paths.h"
+#include "standalone/core/staged_files.h"
 #include "standalone/core/state_lock.h"
-#include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/settings/settings_store.h"
@@ -37,9 +37,9 @@ Result<> changeStored(Result<Settings> (&load)(), const std::function<void(Setti
 }
 
 Result<> storeExternalAddress(const FtpSettings& settings) {
-    return perform(Effect::store, "external address", [&] {
-        return writeKeyValue(statePath(paths::systemInformation), externalAddressKey,
-                             settings.externalAddress);
+    return perform(Effect::store, "external address", [&]() -> Result<> {
+        VELT_ASSIGN_OR_RETURN(const auto file, storePath(paths::systemInformation));
+        return writeKeyValue(file, externalAddressKey, settings.externalAddress);
     });
 }
 

@@ -3,6 +3,7 @@
 #include "base/file.h"
 #include "base/file_lock.h"
 #include "base/unique_fd.h"
+#include "standalone/control/intended_ports.h"
 #include "standalone/control/operation_count.h"
 #include "standalone/control/pending_stops.h"
 #include "standalone/control/service_firewall.h"
@@ -41,14 +42,21 @@ Result<OperationLock> lockOperation(const Daemon& daemon) {
     return OperationLock{std::move(lock), OperationMark(daemon)};
 }
 
-std::vector<int> listenerPorts(const DaemonSettings& settings) {
+/// The ports on which the daemon is to listen; without those that another of our daemons is about to give up.
+std::vector<int> listenerPorts(const Daemon& daemon, const DaemonSettings& settings) {
     std::vector<int> ports;
     for (const DaemonPorts& each : settings.ports) {
-        if (!each.ofSessions) {
+        if (!each.ofSessions && !isGivenUp(each.range.first, daemon)) {
             ports.push_back(each.range.first);
         }
     }
     return ports;
+}
+
+Result<> checkStartable(const Daemon& daemon, const DaemonSettings& settings, const DaemonState& now) {
+    VELT_RETURN_IF_ERROR(
+        probePorts(listenerPorts(daemon, settings), isAlive(now.daemon) ? now.daemon.pid : 0));
+    return daemon.test();
 }
 
 /// Whether the stored settings want the daemon after a stop; fails when it could not be started with them.
@@ -62,8 +70,7 @@ Result<bool> isWantedNext(const Daemon& daemon, const DaemonState& now) {
     if (!isServing(now)) {
         return true;
     }
-    VELT_RETURN_IF_ERROR(probePorts(listenerPorts(*settings), now.daemon.pid));
-    VELT_RETURN_IF_ERROR(daemon.test());
+    VELT_RETURN_IF_ERROR(checkStartable(daemon, *settings, now));
     return true;
 }
 
@@ -169,6 +176,11 @@ Result<> pauseDaemon(const Daemon& daemon) {
         return {};
     }
     return counted(daemon, SupervisedDaemon(daemon).pause());
+}
+
+Result<> checkStart(const Daemon& daemon) {
+    VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
+    return settings.enabled() ? checkStartable(daemon, settings, daemonState(daemon)) : Result<>();
 }
 
 bool lostItsSupervisor(const DaemonState& state) {

@@ -23,6 +23,10 @@ Result<> stopDaemon(const Daemon& daemon);
 /// configuration.
 Result<> stopDaemonForRestart(const Daemon& daemon);
 
+/// Whether a start could succeed, as far as that can be told without one: fails when its ports are held by
+/// another program, or the daemon's own test refuses the stored settings. Changes nothing.
+Result<> checkStart(const Daemon& daemon);
+
 /// Ends the listener only. Refused for a daemon whose sessions end with it.
 Result<> pauseDaemon(const Daemon& daemon);
 

@@ -1,6 +1,7 @@
 #include "standalone/control/port_conflict.h"
 
 #include "schema/settings_table.h"
+#include "standalone/control/intended_ports.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/ports/known_services.h"
 #include "standalone/ports/port_range.h"
@@ -23,7 +24,7 @@ struct Question {
     bool isOnePort() const { return range.first == range.last; }
 };
 
-/// What the stored settings give to a daemon.
+/// What the settings give to a daemon.
 struct Claim {
     const Daemon* daemon;
     DaemonPorts ports;
@@ -43,11 +44,16 @@ PortConflict heldBy(int port, const std::string& holder) {
     return {port, holder, "Port " + std::to_string(port) + " is taken by " + holder + "."};
 }
 
-Result<std::vector<Claim>> loadClaims() {
+Result<std::vector<DaemonPorts>> storedPorts(const Daemon& daemon) {
+    VELT_ASSIGN_OR_RETURN(auto settings, daemon.settings());
+    return std::move(settings.ports);
+}
+
+Result<std::vector<Claim>> loadClaims(Result<std::vector<DaemonPorts>> (*portsOf)(const Daemon&)) {
     std::vector<Claim> claims;
     for (const Daemon* daemon : allDaemons()) {
-        VELT_ASSIGN_OR_RETURN(const auto settings, daemon->settings());
-        for (const DaemonPorts& ports : settings.ports) {
+        VELT_ASSIGN_OR_RETURN(const auto all, portsOf(*daemon));
+        for (const DaemonPorts& ports : all) {
             claims.push_back({daemon, ports});
         }
     }
@@ -138,7 +144,8 @@ Result<std::optional<PortConflict>> conflictWithListener(const Question& questio
         return !question.isOnePort() && isOwnPort(question, claims, port);
     };
     std::erase_if(sockets, [&](const ListeningSocket& socket) {
-        return !contains(question.range, socket.port) || canDoWithout(socket.port);
+        return !contains(question.range, socket.port) || canDoWithout(socket.port) ||
+               (question.daemon != nullptr && isGivenUp(socket.port, *question.daemon));
     });
     if (sockets.empty()) {
         return std::optional<PortConflict>();
@@ -164,15 +171,17 @@ Result<std::optional<PortConflict>> findPortConflict(std::string_view service, i
     if (auto conflict = conflictOfForm(question)) {
         return conflict;
     }
-    VELT_ASSIGN_OR_RETURN(const auto claims, loadClaims());
+    // What is intended counts as the others' already; what the asking service has, it has by what is stored.
+    VELT_ASSIGN_OR_RETURN(const auto intended, loadClaims(portsToBe));
+    VELT_ASSIGN_OR_RETURN(const auto stored, loadClaims(storedPorts));
     VELT_ASSIGN_OR_RETURN(const auto services, loadKnownServices());
-    if (auto conflict = conflictWithConfiguration(question, claims)) {
+    if (auto conflict = conflictWithConfiguration(question, intended)) {
         return conflict;
     }
-    if (auto conflict = conflictWithKnownService(question, claims, services)) {
+    if (auto conflict = conflictWithKnownService(question, stored, services)) {
         return conflict;
     }
-    return conflictWithListener(question, claims);
+    return conflictWithListener(question, stored);
 }
 
 } // namespace velt

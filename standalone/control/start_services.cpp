@@ -22,17 +22,23 @@ Result<> followSettings(const Daemon& daemon) {
                               : stop(daemon);
 }
 
-/// Does it with each daemon, even after a failure with another one, and returns the first failure.
-Result<> forEachDaemon(Result<> (*act)(const Daemon&)) {
+/// Does it with each daemon, or the named one, even after a failure with another one, and returns the first
+/// failure.
+Result<> forEachDaemon(Result<> (*act)(const Daemon&), std::string_view service = {}) {
     Result<> outcome;
     for (const Daemon* daemon : allDaemons()) {
-        auto done = act(*daemon);
+        auto done = service.empty() || service == daemon->apiName ? act(*daemon) : Result<>();
         if (!done) {
             ::syslog(LOG_ERR, "%s", done.error().message.c_str());
             outcome = outcome ? std::move(done) : outcome;
         }
     }
     return outcome;
+}
+
+Result<> startIfOn(const Daemon& daemon) {
+    VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
+    return settings.enabled() ? followSettings(daemon) : Result<>();
 }
 
 Result<> reload(const Daemon& daemon) {
@@ -55,6 +61,13 @@ Result<> stopServices() {
 Result<std::vector<ServiceSessions>> reloadServices(SessionPolicy policy) {
     ServiceRequest request(policy);
     const auto done = forEachDaemon(reload);
+    auto sessions = request.finish();
+    return done ? std::move(sessions) : done.error();
+}
+
+Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service) {
+    ServiceRequest request(policy);
+    const auto done = forEachDaemon(startIfOn, service);
     auto sessions = request.finish();
     return done ? std::move(sessions) : done.error();
 }

@@ -5,6 +5,7 @@
 #include "base/result.h"
 #include "standalone/control/service_request.h"
 
+#include <string_view>
 #include <vector>
 
 namespace velt {
@@ -23,6 +24,9 @@ Result<> stopServices();
 /// some milliseconds. A daemon that does not come up leaves the former one serving. Tells what became of the
 /// sessions; failures are treated in the same way. Within a ServiceRequest, that one's policy counts.
 Result<std::vector<ServiceSessions>> reloadServices(SessionPolicy policy = SessionPolicy::keep);
+
+/// The same for one daemon ("ftp" or "sftp"), or all for "", and starts those that are on and do not run.
+Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service = {});
 
 } // namespace velt
 

@@ -25,6 +25,7 @@ inline constexpr std::string_view systemInformation = "/etc/veltinfo.conf"; ///<
 
 // What this system keeps for itself.
 inline constexpr std::string_view stateLock = "/var/lib/velt/lock";
+inline constexpr std::string_view unfinishedChange = "/var/lib/velt/unfinished-change";
 inline constexpr std::string_view logDatabase = "/var/lib/velt/log.db";
 inline constexpr std::string_view hostKeys = "/var/lib/velt/ssh"; ///< a folder
 inline constexpr std::string_view ownCertificate = "/var/lib/velt/tls/server.crt";

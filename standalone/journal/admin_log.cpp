@@ -7,6 +7,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/journal/catalogue.h"
 #include "standalone/journal/event_bus.h"
+#include "standalone/journal/held_journal.h"
 #include "standalone/journal/log_database.h"
 #include "standalone/journal/request_actor.h"
 
@@ -83,8 +84,14 @@ Result<> store(LogEntry& entry) {
 } // namespace
 
 Result<> logEvent(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
-    LogEntry entry = makeEntry(category, level, event, texts);
-    return perform(Effect::logEntry, entry.sentence, [&entry] {
+    return writeLogEntry(makeEntry(category, level, event, texts));
+}
+
+Result<> writeLogEntry(LogEntry entry) {
+    return perform(Effect::logEntry, entry.sentence, [&entry]() -> Result<> {
+        if (holdBack(entry)) {
+            return {};
+        }
         Result<> stored = store(entry);
         if (stored) {
             publish(entry);

@@ -15,6 +15,10 @@ namespace velt {
 /// the subscribers. Texts are made plain and cut; a null one counts as "". Thread-safe.
 Result<> logEvent(int category, int level, unsigned event, const std::array<const char*, 4>& texts);
 
+/// Writes down an entry that was made before, as it is but for its id, and tells the subscribers.
+/// Thread-safe.
+Result<> writeLogEntry(LogEntry entry);
+
 /// The newest entries that the filter lets through, newest first. Thread-safe.
 Result<std::vector<LogEntry>> queryLog(const LogFilter& filter);
 

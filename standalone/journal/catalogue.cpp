@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 26> entries{{
+constexpr std::array<CatalogueEntry, 28> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -34,6 +34,8 @@ constexpr std::array<CatalogueEntry, 26> entries{{
     // This system's own, far from those of the modules.
     {0x11BF0001, "Logins from %1 are refused for %2 seconds after %3 failed ones at %4."},
     {0x11BF0002, "The ban of %1 was lifted."},
+    {0x11BF0003, "The settings were changed (%1): %2."},
+    {0x11BF0004, "The change %1 was not confirmed in time and is taken back."},
     {0x11BF0010, "The %1 service ended unexpectedly: %2."},
     {0x11BF0011, "The %1 service runs again."},
     {0x11BF0012, "The %1 service was started by another program."},

@@ -1,21 +1,14 @@
 #include "standalone/journal/log_database.h"
 
-#include "base/unique_fd.h"
 #include "standalone/core/error_number.h"
 
-#include <fcntl.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <chrono>
-#include <cstring>
-#include <thread>
 
 namespace velt {
 
 namespace {
-
-constexpr int busyMilliseconds = 5000;
 
 // The version of this table, kept in the database itself.
 constexpr std::int64_t formVersion = 1;
@@ -64,34 +57,6 @@ std::int64_t millisecondsOf(std::chrono::system_clock::time_point time) {
     return std::chrono::floor<std::chrono::milliseconds>(time.time_since_epoch()).count();
 }
 
-int execute(sqlite3* database, const char* sql) {
-    return sqlite3_exec(database, sql, nullptr, nullptr, nullptr);
-}
-
-/// While another process does the same, SQLite refuses the switch at once instead of waiting.
-int switchToWal(sqlite3* database) {
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(busyMilliseconds);
-    for (;;) {
-        const int result = execute(database, "PRAGMA journal_mode = WAL");
-        if (result != SQLITE_BUSY || std::chrono::steady_clock::now() > deadline) {
-            return result;
-        }
-        std::this_thread::sleep_for(std::chrono::milliseconds(2));
-    }
-}
-
-/// Names and addresses are in it: SQLite would make the file readable to all. Its side files take its mode.
-Result<> makeFile(const std::filesystem::path& path) {
-    std::error_code error;
-    std::filesystem::create_directories(path.parent_path(), error);
-    const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
-    if (!fd) {
-        return Error(ErrorNumber::log, "Cannot open the administrator log " + path.string() + ": " +
-                                           std::strerror(errno) + ".");
-    }
-    return {};
-}
-
 } // namespace
 
 struct LogDatabase::Statements {
@@ -107,47 +72,32 @@ LogDatabase::LogDatabase(std::filesystem::path path) : path_(std::move(path)), p
 LogDatabase::~LogDatabase() {
     if (!isOwn()) {
         static_cast<void>(statements_.release());
+        static_cast<void>(database_.release());
         return;
     }
     statements_.reset();
-    sqlite3_close(database_);
 }
 
 Error LogDatabase::cannotBe(const char* what) const {
-    return {ErrorNumber::log, "The administrator log " + path_.string() + " cannot be " + what + ": " +
-                                  sqlite3_errmsg(database_) + "."};
+    return databaseError(database_.get(), path_, what);
 }
 
 Result<std::unique_ptr<LogDatabase>> LogDatabase::open(const std::filesystem::path& path) {
-    VELT_RETURN_IF_ERROR(makeFile(path));
     std::unique_ptr<LogDatabase> log(new LogDatabase(path));
-    const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
-    if (sqlite3_open_v2(path.c_str(), &log->database_, flags, nullptr) != SQLITE_OK) {
-        return log->cannotBe("opened");
-    }
-    VELT_RETURN_IF_ERROR(log->prepare());
+    VELT_ASSIGN_OR_RETURN(log->database_, openDatabase(path));
+    VELT_RETURN_IF_ERROR(log->makeTable());
+    VELT_RETURN_IF_ERROR(log->prepareStatements());
     return log;
-}
-
-Result<> LogDatabase::prepare() {
-    sqlite3_busy_timeout(database_, busyMilliseconds);
-    // With the log ahead of the table, a commit that is not forced to the disk survives the end of the
-    // process; a power failure may take the last entries, never the table's form.
-    if (switchToWal(database_) != SQLITE_OK ||
-        execute(database_, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
-        return cannotBe("opened");
-    }
-    VELT_RETURN_IF_ERROR(makeTable());
-    return prepareStatements();
 }
 
 Result<> LogDatabase::makeTable() {
     // Under the write lock, or two processes could both see that there is no table yet.
-    if (execute(database_, "BEGIN IMMEDIATE") != SQLITE_OK) {
+    if (execute(database_.get(), "BEGIN IMMEDIATE") != SQLITE_OK) {
         return cannotBe("opened");
     }
     Statement version;
-    if (version.prepare(database_, "PRAGMA user_version") != SQLITE_OK || version.step() != SQLITE_ROW) {
+    if (version.prepare(database_.get(), "PRAGMA user_version") != SQLITE_OK ||
+        version.step() != SQLITE_ROW) {
         return cannotBe("opened");
     }
     const std::int64_t found = version.number(0);
@@ -156,17 +106,17 @@ Result<> LogDatabase::makeTable() {
         return Error(ErrorNumber::log, "The administrator log " + path_.string() + " has format " +
                                            std::to_string(found) + ", which this version does not know.");
     }
-    if ((found == 0 && execute(database_, tableSql) != SQLITE_OK) ||
-        execute(database_, indexSql) != SQLITE_OK) {
+    if ((found == 0 && execute(database_.get(), tableSql) != SQLITE_OK) ||
+        execute(database_.get(), indexSql) != SQLITE_OK) {
         return cannotBe("made");
     }
-    return execute(database_, "COMMIT") == SQLITE_OK ? Result<>() : cannotBe("made");
+    return execute(database_.get(), "COMMIT") == SQLITE_OK ? Result<>() : cannotBe("made");
 }
 
 Result<> LogDatabase::prepareStatements() {
     statements_ = std::make_unique<Statements>();
     const auto prepared = [this](Statement& statement, const char* sql) {
-        return statement.prepare(database_, sql) == SQLITE_OK;
+        return statement.prepare(database_.get(), sql) == SQLITE_OK;
     };
     if (prepared(statements_->begin, "BEGIN IMMEDIATE") && prepared(statements_->commit, "COMMIT") &&
         prepared(statements_->insert, insertSql) &&
@@ -184,7 +134,8 @@ bool LogDatabase::isOwn() const {
 bool LogDatabase::leadsTo(const std::filesystem::path& path) const {
     int moved = 0;
     return path == path_ &&
-           sqlite3_file_control(database_, "main", SQLITE_FCNTL_HAS_MOVED, &moved) == SQLITE_OK && moved == 0;
+           sqlite3_file_control(database_.get(), "main", SQLITE_FCNTL_HAS_MOVED, &moved) == SQLITE_OK &&
+           moved == 0;
 }
 
 Result<> LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>& retention) {
@@ -202,8 +153,8 @@ Result<> LogDatabase::append(LogEntry& entry, const std::optional<LogRetention>&
         return {};
     }
     const Error error = cannotBe("written");
-    if (sqlite3_get_autocommit(database_) == 0) {
-        execute(database_, "ROLLBACK");
+    if (sqlite3_get_autocommit(database_.get()) == 0) {
+        execute(database_.get(), "ROLLBACK");
     }
     return error;
 }
@@ -221,7 +172,7 @@ int LogDatabase::insert(LogEntry& entry) {
     insert.bind(10, entry.actor);
     insert.bind(11, entry.address);
     const int result = insert.run();
-    entry.id = sqlite3_last_insert_rowid(database_);
+    entry.id = sqlite3_last_insert_rowid(database_.get());
     return result;
 }
 
@@ -242,7 +193,7 @@ int LogDatabase::removeOld(const LogEntry& newest, const LogRetention& retention
 
 Result<std::vector<LogEntry>> LogDatabase::query(const LogFilter& filter) {
     Statement query;
-    if (query.prepare(database_, querySql(filter).c_str()) != SQLITE_OK) {
+    if (query.prepare(database_.get(), querySql(filter).c_str()) != SQLITE_OK) {
         return cannotBe("read");
     }
     query.bind(1, filter.since ? std::optional(millisecondsOf(*filter.since)) : std::nullopt);

@@ -5,6 +5,7 @@
 #include "base/result.h"
 #include "standalone/journal/log_entry.h"
 #include "standalone/journal/log_retention.h"
+#include "standalone/journal/sqlite_file.h"
 #include "standalone/journal/statement.h"
 
 #include <sys/types.h>
@@ -44,7 +45,6 @@ public:
 private:
     explicit LogDatabase(std::filesystem::path path);
 
-    Result<> prepare();
     Result<> makeTable();
     Result<> prepareStatements();
     int insert(LogEntry& entry);
@@ -55,7 +55,7 @@ private:
 
     std::filesystem::path path_;
     pid_t process_;
-    sqlite3* database_ = nullptr;
+    DatabaseOwner database_;
     std::unique_ptr<Statements> statements_;
 };
 

@@ -5,6 +5,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
+#include "standalone/core/staged_files.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 
@@ -59,7 +60,10 @@ Result<> storeRules(const std::vector<ChrootRule>& rules) {
         text += '\n';
     }
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    return perform(Effect::store, "chroot rules", [&text] { return replaceFile(rulesFile(), text, 0600); });
+    return perform(Effect::store, "chroot rules", [&text]() -> Result<> {
+        VELT_ASSIGN_OR_RETURN(const auto place, storePath(paths::chrootRules));
+        return replaceFile(place, text, 0600);
+    });
 }
 
 Result<> makeRulesFile() {

@@ -6,6 +6,7 @@
 #include "standalone/core/error_number.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/paths.h"
+#include "standalone/core/staged_files.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/settings/settings_files.h"
@@ -23,8 +24,10 @@ Result<Settings> loadFile(std::string_view name, const SettingsFile<Settings>& f
 }
 
 Result<> storeFile(std::string_view subject, std::string_view name, const std::string& contents) {
-    return perform(Effect::store, subject,
-                   [&] { return replaceFile(statePath(name), contents, settingsMode); });
+    return perform(Effect::store, subject, [&]() -> Result<> {
+        VELT_ASSIGN_OR_RETURN(const auto place, storePath(name));
+        return replaceFile(place, contents, settingsMode);
+    });
 }
 
 } // namespace

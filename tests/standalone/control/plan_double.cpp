@@ -62,10 +62,14 @@ Result<std::optional<DaemonPlan>> planFtpDaemon() {
     if (!enablesFtp(record)) {
         return std::optional<DaemonPlan>();
     }
+    auto options = test::planDouble().ftpOptions;
+    if (record.maxuploadrate == test::planDouble().crashingRate) {
+        options.insert(options.end(), {"--refuse", "fatal: out of luck"});
+    }
     return test::makePlan(controlPort(record),
                           std::string(record.portnum) + " " + std::to_string(record.service_flags) + " " +
                               std::to_string(record.maxuploadrate),
-                          test::planDouble().ftpOptions);
+                          options);
 }
 
 Result<std::optional<DaemonPlan>> planSftpDaemon() {

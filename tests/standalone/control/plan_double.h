@@ -11,6 +11,7 @@ namespace velt::test {
 struct PlanDouble {
     bool takesRights = false;             ///< as if each change of the FTP settings took rights away
     bool refuse = false;                  ///< as if the daemon's own test had refused the configuration
+    int crashingRate = -1;                ///< an FTP daemon with this upload rate does not start
     std::vector<std::string> ftpOptions;  ///< further arguments of the FTP daemon
     std::vector<std::string> sftpOptions; ///< of the SFTP daemon
 };

@@ -1,5 +1,6 @@
 // Which changes of the FTP settings end sessions.
 #include "standalone/daemons/proftpd/session_rights.h"
+#include "standalone/settings/lost_rights.h"
 
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"

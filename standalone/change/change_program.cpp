@@ -1,0 +1,206 @@
+#include "standalone/change/change_program.h"
+
+#include "standalone/control/daemon_control.h"
+#include "standalone/control/supervised_daemon.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/paths.h"
+#include "standalone/ports/port_range.h"
+
+#include <algorithm>
+#include <array>
+#include <set>
+#include <utility>
+
+namespace velt {
+
+namespace {
+
+using Wish = DaemonRequests::Wish;
+
+struct StoredFile {
+    std::string_view name;
+    std::string_view subject;
+};
+
+constexpr std::array storedFiles{
+    StoredFile{paths::ftpSettings, "ftp settings"},
+    StoredFile{paths::sftpSettings, "sftp settings"},
+    StoredFile{paths::chrootRules, "chroot rules"},
+    StoredFile{paths::systemInformation, "system information"},
+};
+
+/// "ftp settings"; "run key of ftpd" for one below the folder of run keys.
+std::string subjectOf(const StagedFile& file) {
+    const auto* const known = std::ranges::find(storedFiles, file.name, &StoredFile::name);
+    if (known != storedFiles.end()) {
+        return std::string(known->subject);
+    }
+    return "run key of " + file.name.substr(file.name.rfind('/') + 1);
+}
+
+/// Whether the daemon listens on a port that the other is to have.
+bool isInTheWay(const Daemon& daemon, const Daemon& other) {
+    const auto wanted = other.settings();
+    const auto ports = daemonState(daemon).ports;
+    return wanted && std::ranges::any_of(wanted->ports, [&](const DaemonPorts& each) {
+               return !each.ofSessions && std::ranges::count(ports, each.range.first) != 0;
+           });
+}
+
+ProgramStep storeStep(const StagedFile& file) {
+    const std::string subject = subjectOf(file);
+    return {{StepKind::store, subject}, [file, subject]() -> Result<int> {
+                VELT_RETURN_IF_ERROR(perform(Effect::store, subject, [&] { return store(file); }));
+                return 0;
+            }};
+}
+
+int sessionsOf(const Daemon& daemon) {
+    return static_cast<int>(daemonState(daemon).sessions.size());
+}
+
+/// Does it with the daemon, and tells how many of its sessions that ended.
+Result<int> actOn(const Daemon& daemon, Effect effect, SessionPolicy policy, Result<> (*act)(const Daemon&)) {
+    ServiceRequest request(policy);
+    VELT_RETURN_IF_ERROR(perform(effect, daemon.name, [&] { return act(daemon); }));
+    VELT_ASSIGN_OR_RETURN(const auto services, request.finish());
+    int ended = 0;
+    for (const ServiceSessions& sessions : services) {
+        ended += sessions.ended;
+    }
+    return ended;
+}
+
+ProgramStep stopStep(const Daemon& daemon) {
+    return {{StepKind::stop, std::string(daemon.apiName)},
+            [&daemon] { return actOn(daemon, Effect::stop, SessionPolicy::end, stopDaemon); },
+            sessionsOf(daemon)};
+}
+
+/// A start, in which the daemon's sessions end if the policy, or what the change takes from them, wants it.
+ProgramStep startStep(const Daemon& daemon, bool serves, const StagedRequest& request) {
+    const bool takesRights = &daemon == &ftpDaemon && request.takesFtpRights;
+    const bool ends =
+        request.policy == SessionPolicy::end || (request.policy == SessionPolicy::byChange && takesRights);
+    const SessionPolicy policy = ends ? SessionPolicy::end : request.policy;
+    return {{serves ? StepKind::handOver : StepKind::start, std::string(daemon.apiName)},
+            [&daemon, policy] { return actOn(daemon, Effect::start, policy, startDaemon); },
+            ends ? sessionsOf(daemon) : 0};
+}
+
+/// Outside a request, in which it would wait.
+ProgramStep pauseStep(const Daemon& daemon) {
+    return {{StepKind::pause, std::string(daemon.apiName)}, [&daemon]() -> Result<int> {
+                VELT_RETURN_IF_ERROR(
+                    perform(Effect::stop, daemon.name, [&daemon] { return pauseDaemon(daemon); }));
+                return 0;
+            }};
+}
+
+/// Of a daemon that has nothing else to follow.
+ProgramStep endSessionsStep(const Daemon& daemon) {
+    return {{StepKind::endSessions, std::string(daemon.apiName)},
+            [&daemon] { return actOn(daemon, Effect::start, SessionPolicy::end, startDaemon); },
+            sessionsOf(daemon)};
+}
+
+/// Whether another of the daemons that are still to come holds a port which this one is to have.
+bool mustWait(const Wish& wish, const std::vector<Wish>& rest, const std::set<const Daemon*>& paused) {
+    return wish.start && std::ranges::any_of(rest, [&](const Wish& other) {
+               return other.daemon != wish.daemon && !paused.contains(other.daemon) &&
+                      isInTheWay(*other.daemon, *wish.daemon);
+           });
+}
+
+/// The daemons follow the settings. One that gives up a port which another is to have goes first; where they
+/// exchange ports, one makes room by a pause.
+void addDaemonSteps(const StagedRequest& request, std::vector<ProgramStep>& program) {
+    std::vector<Wish> rest = request.wishes;
+    std::set<const Daemon*> paused;
+    while (!rest.empty()) {
+        auto next =
+            std::ranges::find_if(rest, [&](const Wish& wish) { return !mustWait(wish, rest, paused); });
+        if (next == rest.end()) {
+            const auto pausable = std::ranges::find_if(rest, [&](const Wish& wish) {
+                return wish.daemon->canPause && !paused.contains(wish.daemon);
+            });
+            if (pausable != rest.end()) {
+                program.push_back(pauseStep(*pausable->daemon));
+                paused.insert(pausable->daemon);
+                continue;
+            }
+            next = rest.begin();
+        }
+        const bool serves = isServing(daemonState(*next->daemon)) && !paused.contains(next->daemon);
+        program.push_back(next->start ? startStep(*next->daemon, serves, request) : stopStep(*next->daemon));
+        rest.erase(next);
+    }
+}
+
+std::string textOf(const VELT_FTP_PORT_RANGE& range) {
+    return range.first == range.last ? std::to_string(range.first) : formatPortRange(range);
+}
+
+/// The ports that only the first has. The firewall follows the daemons by itself.
+void addPortSteps(StepKind kind, const OpenPorts& ports, const OpenPorts& others,
+                  std::vector<ProgramStep>& program) {
+    for (const VELT_FTP_PORT_RANGE& range : ports) {
+        const std::string text = textOf(range);
+        if (std::ranges::find(others, text, textOf) == others.end()) {
+            program.push_back({{kind, text}, {}});
+        }
+    }
+}
+
+ProgramStep journalStep(const LogEntry& entry) {
+    return {{StepKind::logEntry, entry.sentence}, {}};
+}
+
+ProgramStep journalStep(const SystemEvent& event) {
+    std::string subject;
+    for (const auto& [name, value] : event.parameters) {
+        subject =
+            value + (subject.empty() ? "" : " ") + subject; // "ftpd stop": by name, the action comes first
+    }
+    return {{StepKind::event, subject}, {}};
+}
+
+} // namespace
+
+std::vector<ProgramStep> programOf(const StagedRequest& request) {
+    std::vector<ProgramStep> program;
+    for (const StagedFile& file : request.files) {
+        program.push_back(storeStep(file));
+    }
+    for (const std::string& keys : request.missingKeys) {
+        program.push_back({{StepKind::store, keys}, {}}); // its daemon's start makes it
+    }
+    addDaemonSteps(request, program);
+    const bool concerned =
+        std::ranges::find(request.wishes, &ftpDaemon, &Wish::daemon) != request.wishes.end();
+    if (request.takesFtpRights && !concerned && request.policy == SessionPolicy::byChange &&
+        sessionsOf(ftpDaemon) > 0) {
+        program.push_back(endSessionsStep(ftpDaemon));
+    }
+    addPortSteps(StepKind::closePort, request.openBefore, request.openAfter, program);
+    addPortSteps(StepKind::openPort, request.openAfter, request.openBefore, program);
+    for (const HeldJournal::Item& item : request.journal) {
+        program.push_back(std::visit([](const auto& each) { return journalStep(each); }, item));
+    }
+    return program;
+}
+
+Result<OpenPorts> openPorts() {
+    OpenPorts open;
+    for (const Daemon* daemon : allDaemons()) {
+        VELT_ASSIGN_OR_RETURN(const auto settings, daemon->settings());
+        for (const DaemonPorts& ports : settings.ports) {
+            if (settings.enabled()) {
+                open.push_back(ports.range);
+            }
+        }
+    }
+    return open;
+}
+
+} // namespace velt

@@ -1,0 +1,70 @@
+#include "standalone/change/daemon_requests.h"
+
+#include "standalone/control/daemon_control.h"
+#include "standalone/control/supervised_daemon.h"
+
+#include <algorithm>
+#include <array>
+
+namespace velt {
+
+namespace {
+
+/// Stores that a daemon's start needs and no request asks for.
+constexpr std::array<std::string_view, 2> madeByStarts{"certificate", "host keys"};
+
+/// Whether what is asked could be done. A stop is the first half of a restart where the settings still want
+/// the daemon: better no stop than one without a start.
+Result<> checkWish(const Daemon& daemon, bool start) {
+    return start || isServing(daemonState(daemon)) ? checkStart(daemon) : Result<>();
+}
+
+} // namespace
+
+DaemonRequests::DaemonRequests() {
+    setEffectHook([this](Effect effect, std::string_view subject) { return decide(effect, subject); });
+}
+
+DaemonRequests::~DaemonRequests() {
+    setEffectHook({});
+}
+
+EffectDecision DaemonRequests::decide(Effect effect, std::string_view subject) {
+    switch (effect) {
+    case Effect::start:
+        return wish(subject, true);
+    case Effect::stop:
+        return wish(subject, false);
+    case Effect::firewall:
+        firewall_ = true;
+        return Result<>();
+    case Effect::store:
+        if (std::ranges::find(madeByStarts, subject) != madeByStarts.end()) {
+            if (std::ranges::find(missingKeys_, subject) == missingKeys_.end()) {
+                missingKeys_.emplace_back(subject);
+            }
+            return Result<>();
+        }
+        return std::nullopt;
+    default:
+        return std::nullopt;
+    }
+}
+
+Result<> DaemonRequests::wish(std::string_view service, bool start) {
+    const Daemon* const daemon = daemonServing(service);
+    auto known = std::ranges::find(wishes_, daemon, &Wish::daemon);
+    // One daemon may serve under several names, and is asked for under each.
+    if (known != wishes_.end() && known->start == start) {
+        return {};
+    }
+    VELT_RETURN_IF_ERROR(checkWish(*daemon, start));
+    if (known == wishes_.end()) {
+        wishes_.push_back({daemon, start});
+    } else {
+        known->start = start;
+    }
+    return {};
+}
+
+} // namespace velt

@@ -1,0 +1,122 @@
+#include "standalone/change/settings_change.h"
+
+#include "standalone/change/change_program.h"
+#include "standalone/change/run_change.h"
+#include "standalone/change/unfinished_change.h"
+#include "standalone/core/paths.h"
+#include "standalone/core/state_lock.h"
+#include "standalone/settings/lost_rights.h"
+#include "standalone/settings/settings.h"
+
+#include <algorithm>
+#include <optional>
+#include <utility>
+
+namespace velt {
+
+namespace {
+
+/// What holds back all that the thread does. What is made last ends first.
+struct Staging {
+    Staging(StateLock lockOfState, StagedFiles stagedFiles, const IntendedPorts& intended)
+        : lock(std::move(lockOfState)), files(std::move(stagedFiles)), ports(intended) {}
+
+    StateLock lock;
+    StagedFiles files;
+    WithIntendedPorts ports;
+    DaemonRequests requests;
+    HeldJournal journal;
+};
+
+/// What was stored at the beginning, as far as it could be read: damaged settings are for the request to
+/// find.
+struct Former {
+    OpenPorts openPorts;
+    std::optional<FtpSettings> ftp;
+};
+
+Former readFormer() {
+    auto ftp = loadFtpSettings();
+    return {openPorts().valueOr({}), ftp ? std::optional(std::move(*ftp)) : std::nullopt};
+}
+
+/// A rule may bind whoever is logged in now.
+bool changesRules(const std::vector<StagedFile>& files) {
+    return std::ranges::find(files, paths::chrootRules, &StagedFile::name) != files.end();
+}
+
+class StagedChange final : public SettingsChange {
+public:
+    StagedChange(Former former, std::unique_ptr<Staging> staging)
+        : former_(std::move(former)), staging_(std::move(staging)) {}
+
+    Result<ChangeOutcome> plan(SessionPolicy policy) override {
+        VELT_ASSIGN_OR_RETURN(const auto request, collect(policy));
+        ChangeOutcome outcome;
+        for (const ProgramStep& each : programOf(request)) {
+            outcome.steps.push_back(each.step);
+            outcome.sessionsEnded += each.sessionsEnded;
+        }
+        return outcome;
+    }
+
+    ChangeOutcome commit(SessionPolicy policy) override {
+        const auto request = collect(policy);
+        if (!request) {
+            staging_.reset();
+            return {{}, request.error()};
+        }
+        const auto program = programOf(*request);
+        StateLock lock = std::move(staging_->lock);
+        staging_.reset();
+        return runChange(*request, program, std::move(lock));
+    }
+
+private:
+    /// Whether open sessions may do what the staged settings do not allow. Where one of them cannot be read,
+    /// the daemon's start will tell.
+    bool takesRightsNow() const {
+        const auto staged = loadFtpSettings();
+        return former_.ftp && staged && takesRights(*former_.ftp, *staged);
+    }
+
+    Result<StagedRequest> collect(SessionPolicy policy) const {
+        StagedRequest request;
+        VELT_ASSIGN_OR_RETURN(request.files, staging_->files.changes());
+        request.wishes = staging_->requests.wishes();
+        request.missingKeys = staging_->requests.missingKeys();
+        request.firewall = staging_->requests.firewall();
+        request.openBefore = former_.openPorts;
+        VELT_ASSIGN_OR_RETURN(request.openAfter, openPorts());
+        request.journal = staging_->journal.items();
+        request.policy = policy;
+        request.takesFtpRights = changesRules(request.files) || takesRightsNow();
+        return request;
+    }
+
+    Former former_;
+    std::unique_ptr<Staging> staging_;
+};
+
+} // namespace
+
+Result<std::unique_ptr<SettingsChange>> SettingsChange::begin(const IntendedPorts& ports) {
+    VELT_ASSIGN_OR_RETURN(auto lock, StateLock::take());
+    Former former = readFormer();
+    VELT_ASSIGN_OR_RETURN(auto files, StagedFiles::begin());
+    auto staging = std::make_unique<Staging>(std::move(lock), std::move(files), ports);
+    return std::unique_ptr<SettingsChange>(
+        std::make_unique<StagedChange>(std::move(former), std::move(staging)));
+}
+
+Result<bool> undoUnfinishedChange() {
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    VELT_ASSIGN_OR_RETURN(const auto files, unfinishedChange());
+    for (const StagedFile& file : files) {
+        VELT_RETURN_IF_ERROR(restore(file));
+    }
+    VELT_RETURN_IF_ERROR(forgetChange());
+    return !files.empty();
+}
+
+} // namespace velt

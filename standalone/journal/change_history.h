@@ -1,0 +1,61 @@
+// Which changes of the settings were made, in the database of the administrator log.
+#ifndef VELT_STANDALONE_JOURNAL_CHANGE_HISTORY_H
+#define VELT_STANDALONE_JOURNAL_CHANGE_HISTORY_H
+
+#include "base/result.h"
+
+#include <chrono>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace velt {
+
+enum class ChangeState {
+    done,
+    waiting,   ///< done, and taken back unless somebody confirms it in time
+    confirmed, ///< done, and was confirmed
+    undone,
+};
+
+/// "done", "waiting", "confirmed", "undone".
+std::string changeStateName(ChangeState state);
+
+/// An accepted change of the settings.
+struct ChangeRecord {
+    std::int64_t id = 0;                        ///< grows with each change; none is used twice
+    std::chrono::system_clock::time_point time; ///< in whole milliseconds
+    std::string actor;
+    std::string address;
+    std::string way;    ///< what was used: "settings", a method's name, "undo 12"
+    std::string fields; ///< what changed, as its host wrote it
+    ChangeState state = ChangeState::done;
+    std::optional<std::chrono::system_clock::time_point> confirmBy; ///< of one that waits, or did
+};
+
+struct ChangeFilter {
+    std::optional<std::int64_t> beforeId; ///< older than this change
+    std::optional<ChangeState> state;
+    int limit = 100; ///< 1 to 1000
+};
+
+/// The newest changes that are kept; older ones are removed, as are those past the age of the administrator
+/// log (log_retention.h).
+inline constexpr int keptChanges = 10'000;
+
+/// Writes the change down, and returns its id. Thread-safe, as the others.
+Result<std::int64_t> recordChange(const ChangeRecord& change);
+
+/// What became of the change. No error when it is not kept any more.
+Result<> setChangeState(std::int64_t id, ChangeState state);
+
+/// Newest first.
+Result<std::vector<ChangeRecord>> queryChanges(const ChangeFilter& filter);
+
+/// Nothing when there is no such change.
+Result<std::optional<ChangeRecord>> changeRecord(std::int64_t id);
+
+} // namespace velt
+
+#endif

@@ -1,0 +1,74 @@
+#include "standalone/journal/sqlite_file.h"
+
+#include "base/unique_fd.h"
+#include "standalone/core/error_number.h"
+
+#include <fcntl.h>
+
+#include <cerrno>
+#include <chrono>
+#include <cstring>
+#include <string>
+#include <system_error>
+#include <thread>
+
+namespace velt {
+
+namespace {
+
+constexpr int busyMilliseconds = 5000;
+
+/// While another process does the same, SQLite refuses the switch at once instead of waiting.
+int switchToWal(sqlite3* database) {
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(busyMilliseconds);
+    for (;;) {
+        const int result = execute(database, "PRAGMA journal_mode = WAL");
+        if (result != SQLITE_BUSY || std::chrono::steady_clock::now() > deadline) {
+            return result;
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    }
+}
+
+/// Names and addresses are in it: SQLite would make the file readable to all. Its side files take its mode.
+Result<> makeFile(const std::filesystem::path& path) {
+    std::error_code error;
+    std::filesystem::create_directories(path.parent_path(), error);
+    const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
+    if (!fd) {
+        return Error(ErrorNumber::log, "Cannot open the administrator log " + path.string() + ": " +
+                                           std::strerror(errno) + ".");
+    }
+    return {};
+}
+
+} // namespace
+
+Error databaseError(sqlite3* database, const std::filesystem::path& path, const char* what) {
+    return {ErrorNumber::log, "The administrator log " + path.string() + " cannot be " + what + ": " +
+                                  sqlite3_errmsg(database) + "."};
+}
+
+int execute(sqlite3* database, const char* sql) {
+    return sqlite3_exec(database, sql, nullptr, nullptr, nullptr);
+}
+
+Result<DatabaseOwner> openDatabase(const std::filesystem::path& path) {
+    VELT_RETURN_IF_ERROR(makeFile(path));
+    const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
+    sqlite3* opened = nullptr;
+    const int result = sqlite3_open_v2(path.c_str(), &opened, flags, nullptr);
+    DatabaseOwner database(opened);
+    if (result != SQLITE_OK) {
+        return databaseError(opened, path, "opened");
+    }
+    sqlite3_busy_timeout(opened, busyMilliseconds);
+    // With the log ahead of the table, a commit that is not forced to the disk survives the end of the
+    // process; a power failure may take the last entries, never the table's form.
+    if (switchToWal(opened) != SQLITE_OK || execute(opened, "PRAGMA synchronous = NORMAL") != SQLITE_OK) {
+        return databaseError(opened, path, "opened");
+    }
+    return database;
+}
+
+} // namespace velt
