@@ -82,6 +82,10 @@ Json::Value ApiClient::post(const std::string& path, const Json::Value& body) {
     return exchange("POST", path, compactJson(body));
 }
 
+Json::Value ApiClient::patch(const std::string& path, const Json::Value& body) {
+    return exchange("PATCH", path, compactJson(body));
+}
+
 void ApiClient::remove(const std::string& path) {
     exchange("DELETE", path, std::nullopt);
 }

@@ -35,6 +35,7 @@ public:
     /// For the paths of the server that are not methods; `path` starts with a slash.
     Json::Value get(const std::string& path);
     Json::Value post(const std::string& path, const Json::Value& body);
+    Json::Value patch(const std::string& path, const Json::Value& body);
     void remove(const std::string& path);
 
     /// As HttpClient::follow; an answer other than 200 is thrown.

@@ -1,5 +1,6 @@
 #include "base/json_value.h"
 #include "base/printable.h"
+#include "cli/change_report.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -19,18 +20,8 @@ namespace {
 struct RuleOptions {
     ChrootRule rule;
     std::string file;
+    ChangeOptions change;
 };
-
-void writeRules(Context& context, const ChrootRules& rules) {
-    if (context.wroteJson(jsonObject({{"rules", rulesToJson(rules)}}))) {
-        return;
-    }
-    Table table({"TYPE", "NAME", "FOLDER"});
-    for (const ChrootRule& rule : rules) {
-        table.add({rule.type, rule.name, rule.path});
-    }
-    table.write(context.console.out);
-}
 
 void showRules(Context& context) {
     const Json::Value answer = context.api.read({chrootApi, 2, "load"});
@@ -45,6 +36,10 @@ void showRules(Context& context) {
     table.write(context.console.out);
 }
 
+Json::Value patchOf(const ChrootRules& rules) {
+    return jsonObject({{"chroot_rules", rulesToJson(rules)}});
+}
+
 void replaceRules(Context& context, const RuleOptions& options) {
     const Json::Value document = readJsonFile(context.console, options.file);
     std::vector<std::string> faults;
@@ -55,21 +50,19 @@ void replaceRules(Context& context, const RuleOptions& options) {
                       "Correct them; 'veltctl chroot rules load --json' shows how rules are written.",
                       faults);
     }
-    context.api.changeWhatWasRead([&] { storeRules(context.api, rules, loadRules(context.api)); });
-    writeRules(context, rules);
+    changeSettings(context, patchOf(rules), options.change);
 }
 
-void changeRules(Context& context, const std::function<void(ChrootRules&)>& change) {
-    ChrootRules rules;
+/// Changes the rules that are stored; once more, when others change them meanwhile.
+void changeRules(Context& context, const ChangeOptions& options,
+                 const std::function<void(ChrootRules&)>& change) {
+    Json::Value report;
     context.api.changeWhatWasRead([&] {
-        const ChrootRules before = loadRules(context.api);
-        rules = before;
+        ChrootRules rules = loadRules(context.api);
         change(rules);
-        if (rules != before) {
-            storeRules(context.api, rules, before);
-        }
+        report = context.api.patch(settingsPath + options.query(), patchOf(rules));
     });
-    writeRules(context, rules);
+    writeReport(context, report);
 }
 
 void addRule(Context& context, const RuleOptions& options) {
@@ -77,7 +70,7 @@ void addRule(Context& context, const RuleOptions& options) {
         throw Failure(ExitCode::usage, "Invalid rule: " + *fault + ".",
                       "Write it as in 'veltctl chroot rules add user NAME /SHARE'.");
     }
-    changeRules(context, [&](ChrootRules& rules) {
+    changeRules(context, options.change, [&](ChrootRules& rules) {
         if (std::ranges::find(rules, options.rule) == rules.end()) {
             rules.push_back(options.rule);
         }
@@ -99,7 +92,7 @@ void removeFrom(ChrootRules& rules, const ChrootRule& wanted) {
 }
 
 void removeRule(Context& context, const RuleOptions& options) {
-    changeRules(context, [&](ChrootRules& rules) { removeFrom(rules, options.rule); });
+    changeRules(context, options.change, [&](ChrootRules& rules) { removeFrom(rules, options.rule); });
 }
 
 struct UserOptions {
@@ -189,7 +182,9 @@ void addRuleCommands(CLI::App& chroot, Command& chosen) {
 
     CLI::App* add = rules->add_subcommand("add", "Add a rule");
     CLI::App* remove = rules->add_subcommand("remove", "Remove the rules of a user or group");
+    addChangeOptions(save, options->change);
     for (CLI::App* command : {add, remove}) {
+        addChangeOptions(command, options->change);
         command->add_option("type", options->rule.type, "user or group")
             ->required()
             ->check(CLI::IsMember({"user", "group"}))

@@ -12,13 +12,14 @@ namespace velt::cli {
 /// The exit status.
 enum class ExitCode {
     done = 0,
-    local = 1,     ///< a file or the output could not be read or written here
-    usage = 2,     ///< the command line is wrong; nothing was asked of the server
-    refused = 3,   ///< the input was refused
-    conflict = 4,  ///< the input conflicts with something else: a port, a share
-    platform = 5,  ///< the server failed to carry it out
-    access = 6,    ///< the server cannot be reached, or does not allow this user or token to do it
-    unhealthy = 8, ///< done, and the server has errors or warnings to tell of
+    local = 1,       ///< a file or the output could not be read or written here
+    usage = 2,       ///< the command line is wrong; nothing was asked of the server
+    refused = 3,     ///< the input was refused
+    conflict = 4,    ///< the input conflicts with something else: a port, a share
+    platform = 5,    ///< the server failed to carry it out
+    access = 6,      ///< the server cannot be reached, or does not allow this user or token to do it
+    wouldChange = 7, ///< no failure: a dry run found something to change
+    unhealthy = 8,   ///< done, and the server has errors or warnings to tell of
 };
 
 class Failure : public std::runtime_error {

@@ -14,7 +14,7 @@ namespace {
 
 constexpr const char* exitCodes =
     "Exit codes: 0 done, 1 local file, 2 usage, 3 input refused, 4 conflict, 5 the server failed, "
-    "6 no connection or no access, 8 the server is not well.";
+    "6 no connection or no access, 7 a dry run found something to change, 8 the server is not well.";
 
 void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
     app.add_flag("--json", options.json, "Write JSON, for programs");
@@ -57,7 +57,7 @@ ExitCode endOfParsing(const CLI::App& app, const CLI::ParseError& error, Console
 
 ExitCode runCommand(const Command& command, const GlobalOptions& options, Console& console) {
     ApiClient api(findServer(options.server, console));
-    Context context{console, api, options.json};
+    Context context{console, api, options.json, ExitCode::done};
     try {
         command(context);
     } catch (const Json::Exception&) {
@@ -85,6 +85,8 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     addSettingsCommands(app, chosen);
     addShareCommands(app, chosen);
     addChrootCommands(app, chosen);
+    addRestartCommand(app, chosen);
+    addHistoryCommands(app, chosen);
     addBanCommands(app, chosen);
     addTokenCommands(app, chosen);
     addDocumentCommands(app, chosen);

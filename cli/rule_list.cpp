@@ -1,18 +1,14 @@
 #include "cli/rule_list.h"
 
 #include "base/json_value.h"
+#include "cli/change_report.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
 #include "cli/server_refusal.h"
 
-#include <algorithm>
-
 namespace velt::cli {
 
 namespace {
-
-const ApiMethod loadMethod{chrootApi, 2, "load"};
-const ApiMethod saveMethod{chrootApi, 2, "save"};
 
 ChrootRule ruleFromJson(const Json::Value& object) {
     return {textAt(object, "type"), textAt(object, "name"), textAt(object, "path")};
@@ -26,15 +22,7 @@ std::optional<std::string> faultIn(const Json::Value& object) {
     return faultOf(ruleFromJson(object));
 }
 
-void replaceRules(ApiClient& api, const ChrootRules& rules) {
-    api.call(saveMethod, jsonObject({{"rules", rulesToJson(rules)}}));
-}
-
 } // namespace
-
-std::string ruleToText(const ChrootRule& rule) {
-    return rule.type + " " + rule.name + " " + rule.path;
-}
 
 // The server takes any type but "user" for a group, and fails to load a rule with an empty path.
 std::optional<std::string> faultOf(const ChrootRule& rule) {
@@ -73,33 +61,15 @@ ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& fa
 }
 
 ChrootRules loadRules(ApiClient& api) {
-    const Json::Value answer = api.read(loadMethod);
+    const Json::Value answer = api.get(settingsPath);
     ChrootRules rules;
-    if (!answer.isObject() || !answer["rules"].isArray()) {
+    if (!answer.isObject() || !answer["chroot_rules"].isArray()) {
         throw unexpectedAnswer("The server's answer contains no chroot rules.");
     }
-    for (const Json::Value& rule : answer["rules"]) {
+    for (const Json::Value& rule : answer["chroot_rules"]) {
         rules.push_back(ruleFromJson(rule));
     }
     return rules;
-}
-
-void storeRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before) {
-    replaceRules(api, rules);
-    const ChrootRules stored = loadRules(api);
-    Failure dropped(ExitCode::refused,
-                    "The server does not know the user or group of a rule, or does not accept its folder.",
-                    "Correct these rules and try again.");
-    for (const ChrootRule& rule : rules) {
-        if (std::ranges::find(stored, rule) == stored.end()) {
-            dropped.note("left out: " + ruleToText(rule));
-        }
-    }
-    if (!dropped.notes().empty()) {
-        replaceRules(api, before);
-        dropped.note("The rules are as they were before.");
-        throw Failure(dropped);
-    }
 }
 
 } // namespace velt::cli

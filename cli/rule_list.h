@@ -20,9 +20,6 @@ struct ChrootRule {
 
 using ChrootRules = std::vector<ChrootRule>;
 
-/// As "user NAME PATH".
-std::string ruleToText(const ChrootRule& rule);
-
 Json::Value rulesToJson(const ChrootRules& rules);
 
 /// What is wrong with a rule, in words.
@@ -32,13 +29,8 @@ std::optional<std::string> faultOf(const ChrootRule& rule);
 /// array is added to `faults`, in words.
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults);
 
-/// What the server has stored.
+/// What the server has stored, by its settings.
 ChrootRules loadRules(ApiClient& api);
-
-/// Stores the rules in place of all stored ones, which are `before`, and loads them again, since the server
-/// leaves out rules that it does not accept. Then `before` is stored again, and Failure (refused) names the
-/// rules that were left out.
-void storeRules(ApiClient& api, const ChrootRules& rules, const ChrootRules& before);
 
 } // namespace velt::cli
 

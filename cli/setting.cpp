@@ -1,11 +1,8 @@
 #include "cli/setting.h"
 
-#include "base/json_value.h"
 #include "base/number_text.h"
-#include "base/printable.h"
 #include "base/text.h"
 #include "cli/failure.h"
-#include "cli/json_io.h"
 #include "schema/setting_text.h"
 
 #include <algorithm>
@@ -43,17 +40,6 @@ Json::Value parseValue(const std::string& word, SettingType type) {
 
 std::string seeHelp(const SettingGroup& group) {
     return std::string("Run 'veltctl ") + group.command + " set --help' for all settings.";
-}
-
-// The server refuses or ignores a passive range without the switch, and the switch without a range.
-void completePassiveRange(Json::Value& change, const Json::Value& current) {
-    if (change.isMember("custom_port") && !change.isMember("custom_port_range")) {
-        change["custom_port_range"] = true;
-    }
-    const bool ranged = change.isMember("custom_port_range") && change["custom_port_range"] == true;
-    if (ranged && !change.isMember("custom_port")) {
-        change["custom_port"] = current["custom_port"];
-    }
 }
 
 } // namespace
@@ -100,7 +86,8 @@ bool isValid(const Json::Value& value, const Setting& setting) {
     if (!hasType(value, setting.type)) {
         return false;
     }
-    return setting.type != SettingType::number || schema::accepts(setting, value.asInt());
+    return setting.type != SettingType::number ||
+           (setting.least <= value.asInt64() && value.asInt64() <= setting.most);
 }
 
 std::string expectationOf(const Setting& setting) {
@@ -135,35 +122,6 @@ Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::s
         result[key] = value;
     }
     return result;
-}
-
-Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted, const Json::Value& current) {
-    Json::Value change = wanted;
-    for (const Setting& setting : group.settings) {
-        if (setting.service != nullptr && !change.isMember(setting.key)) {
-            change[setting.key] = current[setting.key];
-        }
-    }
-    if (group.find("custom_port") != nullptr) {
-        completePassiveRange(change, current);
-    }
-    // The server refuses an empty address, but stores a blank one as none.
-    if (change.isMember("ext_ip") && change["ext_ip"].asString().empty()) {
-        change["ext_ip"] = " ";
-    }
-    return change;
-}
-
-Json::Value changeToJson(const SettingChange& change) {
-    return jsonObject({{"key", change.key}, {"from", change.from}, {"to", change.to}});
-}
-
-std::string changeToText(const SettingChange& change) {
-    const auto shown = [](const Json::Value& value) {
-        const std::string text = displayValue(value);
-        return text.empty() ? std::string("(empty)") : printable(text);
-    };
-    return change.key + ": " + shown(change.from) + " -> " + shown(change.to);
 }
 
 } // namespace velt::cli

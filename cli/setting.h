@@ -44,23 +44,6 @@ std::string expectationOf(const Setting& setting);
 /// key named twice, or a value that the setting cannot have.
 Json::Value parseAssignments(const SettingGroup& group, const std::vector<std::string>& words);
 
-/// The parameters for a "set" that changes what `wanted` names: also the required keys, with their current
-/// values, and the keys without which the wanted ones have no effect.
-Json::Value completeChange(const SettingGroup& group, const Json::Value& wanted, const Json::Value& current);
-
-/// A setting whose value changes, as it is reported.
-struct SettingChange {
-    std::string key;
-    Json::Value from;
-    Json::Value to;
-};
-
-/// As {"key", "from", "to"}.
-Json::Value changeToJson(const SettingChange& change);
-
-/// As "key: from -> to", printable.
-std::string changeToText(const SettingChange& change);
-
 } // namespace velt::cli
 
 #endif

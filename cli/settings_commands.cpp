@@ -1,9 +1,9 @@
 #include "base/json_value.h"
-#include "base/printable.h"
+#include "cli/change_report.h"
 #include "cli/command.h"
-#include "cli/current_settings.h"
-#include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/server_refusal.h"
+#include "cli/setting.h"
 #include "cli/text_table.h"
 #include "schema/setting_text.h"
 
@@ -11,52 +11,23 @@
 
 #include <algorithm>
 #include <memory>
+#include <ostream>
 
 namespace velt::cli {
 
 namespace {
 
-std::vector<SettingChange> differences(const SettingGroup& group, const Json::Value& before,
-                                       const Json::Value& after) {
-    std::vector<SettingChange> changes;
-    for (const Setting& setting : group.settings) {
-        if (before[setting.key] != after[setting.key]) {
-            changes.push_back({setting.key, before[setting.key], after[setting.key]});
-        }
+/// What a "get" answers. Failure when it is no object, or lacks a switch.
+Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
+    Json::Value shown = api.read(group.method("get"));
+    const auto missing = [&](const Setting& setting) {
+        return setting.service != nullptr && !hasType(shown[setting.key], setting.type);
+    };
+    if (!shown.isObject() || std::ranges::any_of(group.settings, missing)) {
+        throw unexpectedAnswer(std::string("The server's answer contains no ") + group.command +
+                               " settings.");
     }
-    return changes;
-}
-
-// The server accepts some values without effect, such as a UTF-8 switch without UTF-8 support.
-void warnOfKeptValues(Context& context, const Json::Value& wanted, const Json::Value& after) {
-    for (const std::string& key : wanted.getMemberNames()) {
-        if (after[key] != wanted[key]) {
-            context.console.err << "veltctl: warning: the server accepted " << key << "="
-                                << printable(displayValue(wanted[key])) << ", but shows "
-                                << printable(displayValue(after[key])) << ".\n";
-        }
-    }
-}
-
-void writeChanges(Context& context, const std::vector<SettingChange>& changes, const Json::Value& after) {
-    if (context.wroteJson(jsonObject({{"changed", jsonArray(changes, changeToJson)}, {"settings", after}}))) {
-        return;
-    }
-    for (const SettingChange& change : changes) {
-        context.console.out << changeToText(change) << '\n';
-    }
-    if (changes.empty()) {
-        context.console.out << "Nothing changed.\n";
-    }
-}
-
-Json::Value readBack(Context& context, const SettingGroup& group) {
-    try {
-        return readSettings(context.api, group);
-    } catch (Failure& failure) {
-        failure.note("The change was accepted, but the new settings could not be read.");
-        throw;
-    }
+    return shown;
 }
 
 void showSettings(Context& context, const SettingGroup& group) {
@@ -73,24 +44,18 @@ void showSettings(Context& context, const SettingGroup& group) {
     table.write(context.console.out);
 }
 
-void changeSettings(Context& context, const SettingGroup& group, const std::vector<std::string>& words) {
-    const Json::Value wanted = parseAssignments(group, words);
-    CurrentSettings before;
-    context.api.changeWhatWasRead([&] {
-        before = readCurrentSettings(context.api, group, wanted);
-        context.api.call(group.method("set"), completeChange(group, wanted, before.stored));
-    });
-    const Json::Value after = readBack(context, group);
-    writeChanges(context, differences(group, before.shown, after), after);
-    for (const std::string& doubt : before.doubts) {
-        context.console.err << "veltctl: warning: " << printable(doubt) << '\n';
+/// A range has no effect without its switch.
+Json::Value withItsSwitch(Json::Value wanted) {
+    if (wanted.isMember("custom_port") && !wanted.isMember("custom_port_range")) {
+        wanted["custom_port_range"] = true;
     }
-    warnOfKeptValues(context, wanted, after);
+    return wanted;
 }
 
 struct SettingsOptions {
     int version;
     std::vector<std::string> words;
+    ChangeOptions change;
 };
 
 std::string footerOf(const SettingGroup& group) {
@@ -114,7 +79,7 @@ void addVersion(CLI::App* command, int& version, int newest) {
 void addGroup(CLI::App& app, Command& chosen, const schema::SettingGroup& table) {
     const std::string title = table.title;
     const int newest = table.newestApiVersion;
-    auto options = std::make_shared<SettingsOptions>(SettingsOptions{newest, {}});
+    auto options = std::make_shared<SettingsOptions>(SettingsOptions{newest, {}, {}});
     CLI::App* area = app.add_subcommand(table.name, "Read and change " + title);
     area->require_subcommand(1);
     CLI::App* get = area->add_subcommand("get", "Show " + title);
@@ -124,12 +89,13 @@ void addGroup(CLI::App& app, Command& chosen, const schema::SettingGroup& table)
     set->footer(footerOf(newestGroupOf(table)));
     if (newest > 1) {
         addVersion(get, options->version, newest);
-        addVersion(set, options->version, newest);
     }
     onWords(get, chosen,
             [options, &table](Context& context) { showSettings(context, groupOf(table, options->version)); });
+    addChangeOptions(set, options->change);
     onWords(set, chosen, [options, &table](Context& context) {
-        changeSettings(context, groupOf(table, options->version), options->words);
+        const Json::Value wanted = withItsSwitch(parseAssignments(newestGroupOf(table), options->words));
+        changeSettings(context, jsonObject({{table.name, wanted}}), options->change, table.name);
     });
 }
 

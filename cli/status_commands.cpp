@@ -92,9 +92,10 @@ std::string describeEvent(const std::string& event, const Json::Value& data) {
         const std::string actor = textAt(data, "actor");
         return textAt(data, "event") + " " + textAt(data, "text") + (actor.empty() ? "" : " (" + actor + ")");
     }
-    if (event == "request") {
-        return textAt(data, "api") + " v" + textAt(data, "version") + " " + textAt(data, "method") + " by " +
-               textAt(data, "actor") + " (" + textAt(data, "request_id") + ")";
+    if (event == "change") {
+        const std::string id = textAt(data, "id");
+        return textAt(data, "way") + " by " + textAt(data, "actor") +
+               (id.empty() ? "" : " (change " + id + ")");
     }
     return displayValue(data);
 }
@@ -138,8 +139,8 @@ void addStatusCommands(CLI::App& app, Command& chosen) {
         ->type_name("N");
     events
         ->add_option("--kind", options->kinds,
-                     "Only events of these kinds, separated by commas: service, log, request")
-        ->check(CLI::IsMember({"service", "log", "request"}))
+                     "Only events of these kinds, separated by commas: service, log, ban, change")
+        ->check(CLI::IsMember({"service", "log", "ban", "change"}))
         ->delimiter(',')
         ->allow_extra_args(false)
         ->type_name("KIND");

@@ -98,6 +98,11 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     App app(settings, table, log);
     HttpServer server(app, possibleLimits(config, log), config.tls);
     const Json::Value ready = listenEverywhere(config, server, log);
+    if (const auto undone = velt::undoUnfinishedChange(); !undone) {
+        log.write("a change that was cut off half-way cannot be undone: " + undone.error().message);
+    } else if (*undone) {
+        log.write("a change was cut off half-way: the settings are as they were before it");
+    }
     if (const auto started = velt::startEnabledServices(); !started) {
         log.write("some enabled services did not start: " + started.error().message);
     }

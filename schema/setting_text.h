@@ -17,6 +17,7 @@ struct BooleanWords {
 
 inline constexpr BooleanWords onOff{"on", "off", "on or off"};
 inline constexpr BooleanWords zeroOne{"1", "0", "0 or 1"};
+inline constexpr BooleanWords trueFalse{"true", "false", "true or false"};
 
 /// The numbers that are meant: "1 to 65535", "0 or more"; "" where all are.
 std::string rangeText(const Setting& setting);

@@ -5,12 +5,13 @@ _veltctl_words() {
     local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
         enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
     case $1 in
-        '') echo 'status doctor log events ftp security sftp shares chroot bans tokens export import call' ;;
+        '') echo 'status doctor restart log events ftp security sftp shares chroot history undo confirm bans tokens export import call' ;;
         ftp | security | sftp) echo 'get set' ;;
-        'ftp set') echo "$ftp utf8_mode= enable_utf8= use_utf8=" ;;
+        'ftp set') echo "$ftp utf8_mode=" ;;
         'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
         'sftp set') echo 'enable= portnum=' ;;
         chroot) echo 'users rules' ;;
+        restart) echo 'ftp sftp' ;;
         'chroot users') echo 'list add delete' ;;
         'chroot rules') echo 'load save add remove' ;;
         'chroot rules add' | 'chroot rules remove') echo 'user group' ;;
@@ -26,11 +27,14 @@ _veltctl_options() {
         '') echo '--version' ;;
         log) echo '--since --event --actor --before --limit --all --follow' ;;
         events) echo '--count --kind' ;;
-        'ftp get' | 'ftp set') echo '--api-version' ;;
+        'ftp get') echo '--api-version' ;;
+        'ftp set' | 'security set' | 'sftp set' | 'chroot rules save' | 'chroot rules add' | 'chroot rules remove' | undo | import)
+            echo '--dry-run --keep-sessions --end-sessions --confirm-within' ;;
+        history) echo '--before --limit' ;;
+        restart) echo '--end-sessions' ;;
         'chroot users list') echo '--others --offset --limit --type --domain --filter' ;;
         'tokens create') echo '--role' ;;
         export) echo '--output' ;;
-        import) echo '--dry-run' ;;
         call) echo '--list' ;;
     esac
 }
@@ -39,7 +43,7 @@ _veltctl_options() {
 _veltctl_takes_word() {
     case $1 in
         --url | --socket | --token-file | --ca-file | --timeout | --since | --event | --actor | --before | --limit | \
-            --count | --kind | --api-version | --offset | --type | --domain | --filter | --role | --output | -o) return 0 ;;
+            --count | --kind | --api-version | --offset | --type | --domain | --filter | --role | --output | --confirm-within | -o) return 0 ;;
     esac
     return 1
 }
@@ -48,7 +52,7 @@ _veltctl_takes_word() {
 _veltctl_option_value() {
     case $1 in
         --type) COMPREPLY=($(compgen -W 'local domain ldap all' -- "$2")) ;;
-        --kind) COMPREPLY=($(compgen -W 'service log request' -- "$2")) ;;
+        --kind) COMPREPLY=($(compgen -W 'service log ban change' -- "$2")) ;;
         --role) COMPREPLY=($(compgen -W 'admin viewer' -- "$2")) ;;
         --api-version) COMPREPLY=($(compgen -W '1 2 3' -- "$2")) ;;
         --socket | --token-file | --ca-file | --output | -o) _veltctl_files "$2" ;;

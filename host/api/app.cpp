@@ -3,6 +3,7 @@
 #include "host/api/bans.h"
 #include "host/api/log_page.h"
 #include "host/api/problem.h"
+#include "host/api/restart.h"
 #include "host/api/status.h"
 #include "host/api/tokens.h"
 #include "host/base/percent_encoding.h"
@@ -77,9 +78,18 @@ private:
 
 App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
     : log_(log), tokens_(settings.tokenFile), access_(settings.access, tokens_, log),
-      platformEvents_(events_), rows_(table, openApi_, metrics_, events_, log),
+      platformEvents_(events_), changes_(table, metrics_, events_, log),
+      rows_(table, openApi_, metrics_, changes_, log), settings_(table, openApi_, changes_),
+      history_(table, settings_, log),
       order_(settings.workers, settings.maxWaiting, settings.maxWaitingBytes) {
     addRoutes(table);
+    confirmations_.emplace(history_, order_);
+    changes_.onWaiting([this] { confirmations_->wake(); });
+}
+
+void App::stop() {
+    order_.stop(); // first: its tasks wake the other
+    confirmations_.reset();
 }
 
 void App::addRoutes(const ModuleTable& table) {
@@ -87,6 +97,9 @@ void App::addRoutes(const ModuleTable& table) {
         std::ranges::move(routes, std::back_inserter(routes_));
     };
     add(rows_.routes());
+    add(settings_.routes());
+    add(history_.routes());
+    add({restartRoute(log_)});
     add(statusRoutes(table));
     add(banRoutes(log_));
     add(tokenRoutes(tokens_, log_));

@@ -3,8 +3,11 @@
 #define VELT_HOST_API_APP_H
 
 #include "host/api/access_control.h"
+#include "host/api/all_settings.h"
+#include "host/api/confirmation_watch.h"
 #include "host/api/events.h"
 #include "host/api/health.h"
+#include "host/api/history.h"
 #include "host/api/metrics.h"
 #include "host/api/openapi.h"
 #include "host/api/route.h"
@@ -34,6 +37,9 @@ class App final : public HttpHandler {
 public:
     /// The table and the log outlive it. Throws TokenError.
     App(const AppSettings& settings, const ModuleTable& table, HostLog& log);
+    ~App() override { stop(); }
+    App(const App&) = delete;
+    App& operator=(const App&) = delete;
 
     std::optional<Refusal> checkAccess(const HttpRequest& head, const Peer& peer,
                                        Principal& principal) override;
@@ -44,7 +50,7 @@ public:
     void addEventReader(const std::shared_ptr<EventReader>& reader) override;
 
     /// Finishes the accepted requests and accepts no more.
-    void stop() { order_.stop(); }
+    void stop();
 
 private:
     /// A call that is being answered.
@@ -71,9 +77,13 @@ private:
     HealthMonitor health_;
     EventHub events_;
     PlatformEvents platformEvents_;
+    Changes changes_;
     Rows rows_;
+    AllSettings settings_;
+    History history_;
     std::vector<Route> routes_;
-    RequestOrder order_; // last, so that its threads end before what they use
+    RequestOrder order_; // behind what its threads use, so that they end first
+    std::optional<ConfirmationWatch> confirmations_;
 };
 
 } // namespace velt::host

@@ -5,7 +5,7 @@
 #include "base/text.h"
 #include "host/api/problem.h"
 #include "host/base/clock.h"
-#include "host/base/percent_encoding.h"
+#include "host/base/query_text.h"
 
 #include <algorithm>
 #include <array>
@@ -13,7 +13,6 @@
 #include <climits>
 #include <cstdio>
 #include <functional>
-#include <sstream>
 
 namespace velt::host {
 
@@ -40,12 +39,6 @@ std::optional<unsigned> eventNumber(const std::string& text) {
     const char* const end = text.data() + text.size();
     const auto [stop, error] = std::from_chars(text.data() + 2, end, value, 16);
     return error == std::errc() && stop == end ? std::optional(value) : std::nullopt;
-}
-
-/// HTML forms encode a space as "+".
-std::optional<std::string> queryValue(std::string text) {
-    std::replace(text.begin(), text.end(), '+', ' ');
-    return percentDecoded(text);
 }
 
 /// `take` returns false for a value other than the expected.
@@ -83,8 +76,8 @@ constexpr std::array<Filter, 5> filters{{
      }},
 }};
 
-void takeFilter(const std::string& key, const std::string& text, LogFilter& filter) {
-    const auto value = queryValue(text);
+void takeFilter(const QueryParameter& parameter, LogFilter& filter) {
+    const auto& [key, value] = parameter;
     if (!value) {
         throw BadFilter{{key, "a percent-encoded value in UTF-8"}};
     }
@@ -101,11 +94,8 @@ void takeFilter(const std::string& key, const std::string& text, LogFilter& filt
 /// Reads "since=...&event=...". Throws BadFilter.
 LogFilter parseQuery(const std::string& query) {
     LogFilter filter;
-    std::istringstream parts(query);
-    for (std::string part; std::getline(parts, part, '&');) {
-        const std::size_t equals = part.find('=');
-        takeFilter(part.substr(0, equals), equals == std::string::npos ? "" : part.substr(equals + 1),
-                   filter);
+    for (const QueryParameter& parameter : queryParameters(query)) {
+        takeFilter(parameter, filter);
     }
     return filter;
 }

@@ -19,7 +19,7 @@ namespace {
 const prometheus::Histogram::BucketBoundaries durations{0.001, 0.003, 0.01, 0.03, 0.1, 0.3, 1, 3, 10, 30};
 
 std::map<std::string, std::string> labelsOf(const Row& row, const Outcome& outcome) {
-    std::string result = outcome.down.empty() ? "success" : "service_down";
+    std::string result = outcome.takenBack ? "taken_back" : "success";
     if (outcome.kind != Outcome::Kind::success) {
         result = outcome.kind == Outcome::Kind::refused ? std::to_string(outcome.code) : "defect";
     }

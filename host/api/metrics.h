@@ -22,7 +22,7 @@ public:
     Metrics(const Metrics&) = delete;
     Metrics& operator=(const Metrics&) = delete;
 
-    /// Counts a served request under "success", the module's code, "service_down" or "defect".
+    /// Counts a served request under "success", the module's code, "taken_back" or "defect".
     void countRequest(const Row& row, const Outcome& outcome);
 
     /// Counts, by its status, an answer that no module took part in.

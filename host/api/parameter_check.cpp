@@ -48,10 +48,22 @@ bool isTextSetting(const Row& row, std::string_view key) {
     });
 }
 
+std::optional<FieldError> findUnfitRule(const Json::Value& rules) {
+    for (Json::ArrayIndex i = 0; rules.isArray() && i < rules.size(); i++) {
+        if (!rules[i].isObject()) {
+            return FieldError{"rules[" + std::to_string(i) + "]", "an object"};
+        }
+    }
+    return std::nullopt;
+}
+
 } // namespace
 
-std::optional<FieldError> findUnfitText(const Row& row, const Json::Value& parameters) {
+std::optional<FieldError> findUnfitParameter(const Row& row, const Json::Value& parameters) {
     if (auto found = findNul(parameters, "")) {
+        return found;
+    }
+    if (auto found = findUnfitRule(parameters["rules"])) {
         return found;
     }
     for (const std::string& name : parameters.getMemberNames()) {

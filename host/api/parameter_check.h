@@ -1,4 +1,4 @@
-// Texts in parameters that would not arrive as they were sent.
+// Parameters that would not arrive as they were sent.
 #ifndef VELT_HOST_API_PARAMETER_CHECK_H
 #define VELT_HOST_API_PARAMETER_CHECK_H
 
@@ -11,10 +11,11 @@
 
 namespace velt::host {
 
-/// The first text, at any depth, that contains U+0000: the platform takes only what is before it. And the
-/// first setting that is a text, which is always one line, with a control character. Nothing when there is
-/// none; the module decides on all else.
-std::optional<FieldError> findUnfitText(const Row& row, const Json::Value& parameters);
+/// The first rule that is not an object, which the module could not look into. The first text, at any depth,
+/// that contains U+0000: the platform takes only what is before it. And the first setting that is a text,
+/// which is always one line, with a control character. Nothing when there is none; the module decides on all
+/// else.
+std::optional<FieldError> findUnfitParameter(const Row& row, const Json::Value& parameters);
 
 } // namespace velt::host
 

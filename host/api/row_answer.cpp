@@ -2,7 +2,6 @@
 
 #include "base/json_value.h"
 #include "host/api/problem.h"
-#include "host/api/service_status.h"
 #include "host/module/module_log.h"
 
 #include <algorithm>
@@ -13,26 +12,52 @@ namespace velt::host {
 namespace {
 
 struct Meaning {
-    int code;
+    int code; ///< the module's
     int status;
     const char* title;
-    bool portTaken;
+    const char* field = "";    ///< that is at fault; "" when the code does not say
+    const char* expected = ""; ///< of the field
+    bool portTaken = false;
 };
 
 constexpr int badParameter = 1901;
-constexpr Meaning otherFailure{0, 500, "The operation failed", false};
+constexpr const char* freePort = "a free port";
 
 constexpr std::array<Meaning, 5> meanings{{
-    {badParameter, 422, "A parameter is invalid", false},
-    {1903, 409, "The FTP port is taken", true},
-    {1904, 409, "The passive port range is taken", true},
-    {1905, 409, "The share cannot be reached over FTP", false},
-    {1951, 409, "The SFTP port is taken", true},
+    {badParameter, 422, "A parameter is invalid"},
+    {1903, 409, "The FTP port is taken", "portnum", freePort, true},
+    {1904, 409, "The passive port range is taken", "custom_port", freePort, true},
+    {1905, 409, "The share cannot be reached over FTP", "anonymous_chroot_share",
+     "a share that is offered over FTP"},
+    {1951, 409, "The SFTP port is taken", "portnum", freePort, true},
 }};
 
-const Meaning& meaningOf(int code) {
-    const auto* const found = std::ranges::find(meanings, code, &Meaning::code);
-    return found == meanings.end() ? otherFailure : *found;
+constexpr Meaning cannotBe{0, 422, "The settings cannot be like this"};
+constexpr Meaning portInUse{0, 409, "A port is taken"};
+constexpr Meaning otherFailure{0, 500, "The operation failed"};
+
+/// Of a failure for which the module has no code of its own: its kind is the platform's to tell.
+Meaning meaningOf(ErrorNumber error) {
+    switch (error) {
+    case ErrorNumber::invalid:
+    case ErrorNumber::notFound:
+        return cannotBe;
+    case ErrorNumber::portTaken:
+        return portInUse;
+    default:
+        return otherFailure;
+    }
+}
+
+Meaning meaningOf(const Outcome& outcome) {
+    const auto* const found = std::ranges::find(meanings, outcome.code, &Meaning::code);
+    if (found == meanings.end()) {
+        return meaningOf(outcome.platform.error);
+    }
+    // A port that nobody holds is none.
+    return found->portTaken && outcome.platform.conflict.holder.empty()
+               ? Meaning{outcome.code, cannotBe.status, cannotBe.title, found->field, "ports from 1 to 65535"}
+               : *found;
 }
 
 void append(std::string& detail, const std::string& sentence) {
@@ -49,17 +74,6 @@ std::string describe(const FieldError& error) {
     return error.field + ": expected " + error.expected + ".";
 }
 
-/// How far a refused change got.
-std::string extentOf(const PlatformReport& platform) {
-    if (!platform.changed) {
-        return "Nothing was changed.";
-    }
-    if (!platform.stored) {
-        return "";
-    }
-    return platform.storeFailed ? "Some of the new settings are stored." : "The new settings are stored.";
-}
-
 std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& meaning,
                      const std::vector<FieldError>& errors) {
     std::string detail;
@@ -74,39 +88,48 @@ std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& mean
         append(detail, outcome.platform.sentence);
     }
     if (!row.reads()) {
-        append(detail, extentOf(outcome.platform));
+        append(detail, "Nothing was changed.");
     }
     return detail;
 }
 
+/// What is wrong with the parameters, as far as their schema or the code says.
+std::vector<FieldError> errorsOf(const Row& row, const Json::Value& parameters, const Outcome& outcome,
+                                 const OpenApi& openApi) {
+    if (outcome.code == badParameter) {
+        return openApi.explain(row, parameters);
+    }
+    const Meaning meaning = meaningOf(outcome);
+    return *meaning.field == '\0' ? std::vector<FieldError>{}
+                                  : std::vector<FieldError>{{meaning.field, meaning.expected}};
+}
+
 HttpResponse refused(const Row& row, const Outcome& outcome, const std::vector<FieldError>& errors,
                      const std::string& requestId) {
-    const Meaning& meaning = meaningOf(outcome.code);
-    Json::Value members = jsonObject({{"title", meaning.title},
-                                      {"code", outcome.code},
-                                      {"detail", detailOf(row, outcome, meaning, errors)}});
+    const Meaning meaning = meaningOf(outcome);
+    // The title says what is wrong with the field of a code.
+    const bool explain = outcome.code == badParameter;
+    Json::Value members = jsonObject(
+        {{"title", meaning.title},
+         {"code", outcome.code},
+         {"detail", detailOf(row, outcome, meaning, explain ? errors : std::vector<FieldError>{})}});
     if (!row.reads()) {
-        members["changed"] = outcome.platform.changed;
+        members["changed"] = false;
     }
     for (const FieldError& error : errors) {
         members["errors"].append(toObject(error));
     }
-    if (meaning.portTaken && !outcome.platform.conflict.holder.empty()) {
+    if (meaning.portTaken) {
         members["holder"] = outcome.platform.conflict.holder;
     }
     return problemWith(meaning.status, std::move(members), requestId);
 }
 
-/// The module accepted the request, but a service that is switched on does not run.
-HttpResponse serviceDown(const Outcome& outcome, const std::string& requestId) {
-    const std::string extent = outcome.platform.changed ? "The change is stored. " : "Nothing was changed. ";
-    const auto describe = [](const ServiceDown& down) { return toObject(down); };
-    return problemWith(500,
-                       jsonObject({{"title", "A service that is switched on does not run"},
-                                   {"detail", extent + sentenceOf(outcome.down)},
-                                   {"changed", outcome.platform.changed},
-                                   {"down", jsonArray(outcome.down, describe)}}),
-                       requestId);
+HttpResponse broken(const Outcome& outcome, const std::string& requestId) {
+    return problem(500,
+                   "The module is faulty: " + outcome.defect +
+                       ". The log of veltd says more under this request id.",
+                   requestId);
 }
 
 } // namespace
@@ -115,21 +138,24 @@ HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outc
                        const OpenApi& openApi, const std::string& requestId) {
     switch (outcome.kind) {
     case Outcome::Kind::success:
-        if (!outcome.down.empty()) {
-            return serviceDown(outcome, requestId);
-        }
         return outcome.data.isNull() ? HttpResponse{204, "", "", {}} : jsonResponse(200, outcome.data);
     case Outcome::Kind::refused:
-        return refused(row, outcome,
-                       outcome.code == badParameter ? openApi.explain(row, parameters)
-                                                    : std::vector<FieldError>{},
-                       requestId);
+        return refused(row, outcome, errorsOf(row, parameters, outcome, openApi), requestId);
     default:
-        return problem(500,
-                       "The module is faulty: " + outcome.defect +
-                           ". The log of veltd says more under this request id.",
-                       requestId);
+        return broken(outcome, requestId);
     }
+}
+
+HttpResponse sectionRefusal(const std::string& section, const Row& row, const Json::Value& parameters,
+                            const Outcome& outcome, const OpenApi& openApi, const std::string& requestId) {
+    if (outcome.kind == Outcome::Kind::broken) {
+        return broken(outcome, requestId);
+    }
+    auto errors = errorsOf(row, parameters, outcome, openApi);
+    for (FieldError& error : errors) {
+        error.field.insert(0, "/" + section + "/");
+    }
+    return refused(row, outcome, errors, requestId);
 }
 
 } // namespace velt::host

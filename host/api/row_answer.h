@@ -15,6 +15,11 @@ namespace velt::host {
 HttpResponse answerFor(const Row& row, const Json::Value& parameters, const Outcome& outcome,
                        const OpenApi& openApi, const std::string& requestId);
 
+/// The same refusal for a part of the settings document: it names the field of the section that is at fault,
+/// by a JSON Pointer.
+HttpResponse sectionRefusal(const std::string& section, const Row& row, const Json::Value& parameters,
+                            const Outcome& outcome, const OpenApi& openApi, const std::string& requestId);
+
 } // namespace velt::host
 
 #endif

@@ -4,7 +4,6 @@
 #include "host/api/parameter_check.h"
 #include "host/api/problem.h"
 #include "host/api/row_answer.h"
-#include "host/api/service_status.h"
 #include "host/base/json.h"
 
 #include <array>
@@ -21,10 +20,19 @@ std::string milliseconds(double seconds) {
     return text.data();
 }
 
+/// The module's answer; with what else is to be said of the change, where it has room for that.
+HttpResponse answerOf(const ChangeReport& report, HttpResponse ofModule) {
+    if (report.dryRun) {
+        return jsonResponse(200, toObject(report));
+    }
+    const bool hasRoom = ofModule.status == 204;
+    return hasRoom && !report.down.empty() ? jsonResponse(200, toObject(report)) : std::move(ofModule);
+}
+
 } // namespace
 
-Rows::Rows(const ModuleTable& table, const OpenApi& openApi, Metrics& metrics, EventHub& events, HostLog& log)
-    : table_(table), openApi_(openApi), metrics_(metrics), events_(events), log_(log) {}
+Rows::Rows(const ModuleTable& table, const OpenApi& openApi, Metrics& metrics, Changes& changes, HostLog& log)
+    : table_(table), openApi_(openApi), metrics_(metrics), changes_(changes), log_(log) {}
 
 std::vector<Route> Rows::routes() {
     using Kind = RequestOrder::Kind;
@@ -59,62 +67,50 @@ HttpResponse Rows::call(const Row& row, const Call& call) {
     if (!parameters) {
         return notAnObject(parameters.error(), " Nothing was changed.", call.id);
     }
-    if (const auto unfit = findUnfitText(row, *parameters)) {
+    if (const auto unfit = findUnfitParameter(row, *parameters)) {
         return fieldProblem(422, *unfit, " Nothing was changed.", call.id);
     }
-    // Writes run one at a time, so nothing can come between this check and the change.
-    if (!row.reads() && !revision_.allows(call.request.ifMatch)) {
-        return problem(412, "The settings have changed since they were read. Nothing was changed.", call.id);
-    }
-    return callAndAnswer(row, *parameters, call);
-}
-
-HttpResponse Rows::callAndAnswer(const Row& row, const Json::Value& parameters, const Call& call) {
-    Outcome outcome = callRow(row, parameters, call.principal.actor, call.principal.address);
-    countStarts(outcome.platform);
-    if (!row.reads() && outcome.kind == Outcome::Kind::success) {
-        // A change that finds nothing to do must not hide that an earlier one failed half-way.
-        outcome.down = startWhatIsDown(call.principal);
-    }
-    HttpResponse response = answerFor(row, parameters, outcome, openApi_, call.id);
-    metrics_.countRequest(row, outcome);
-    logOutcome(row, outcome, response.status, call);
-    if (outcome.platform.changed) {
-        revision_.advance();
-    }
-    response.headers.emplace_back("ETag", revision_.tag());
-    if (!row.reads() && outcome.platform.changed) {
-        publishChange(row, call);
-    }
+    HttpResponse response = row.reads() ? read(row, *parameters, call) : change(row, *parameters, call);
+    response.headers.emplace_back("ETag", changes_.revision().tag());
     return response;
 }
 
-std::vector<ServiceDown> Rows::startWhatIsDown(const Principal& principal) {
-    std::vector<ServiceDown> down = servicesDown();
-    if (down.empty()) {
-        return down;
+HttpResponse Rows::read(const Row& row, const Json::Value& parameters, const Call& call) {
+    const Outcome outcome = callRow(row, parameters, call.principal.actor, call.principal.address);
+    HttpResponse response = answerFor(row, parameters, outcome, openApi_, call.id);
+    note(row, outcome, response.status, call);
+    return response;
+}
+
+HttpResponse Rows::change(const Row& row, const Json::Value& parameters, const Call& call) {
+    const auto options = parseChangeOptions(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&options)) {
+        return fieldProblem(400, *bad, " Nothing was changed.", call.id);
     }
-    PlatformRequest platform(principal.actor, principal.address);
-    (void)startEnabledServices(); // servicesDown tells what failed
-    countStarts(platform.finish());
-    return servicesDown();
-}
-
-void Rows::countStarts(const PlatformReport& platform) {
-    for (const std::string& service : platform.started) {
-        metrics_.countDaemonStart(service);
+    // Writes run one at a time, so nothing can come between this check and the change.
+    if (!changes_.revision().allows(call.request.ifMatch)) {
+        return problem(412, "The settings have changed since they were read. Nothing was changed.", call.id);
     }
+    Outcome outcome;
+    const auto made = changes_.make(
+        {row.name(), call, std::get<ChangeOptions>(options), {}}, [&]() -> std::optional<HttpResponse> {
+            outcome = callRow(row, parameters, call.principal.actor, call.principal.address);
+            if (outcome.kind == Outcome::Kind::success) {
+                return std::nullopt;
+            }
+            return answerFor(row, parameters, outcome, openApi_, call.id);
+        });
+    const auto* const report = std::get_if<ChangeReport>(&made);
+    HttpResponse response = report != nullptr
+                                ? answerOf(*report, answerFor(row, parameters, outcome, openApi_, call.id))
+                                : std::get<HttpResponse>(made);
+    outcome.takenBack = report == nullptr && outcome.kind == Outcome::Kind::success;
+    note(row, outcome, response.status, call);
+    return response;
 }
 
-void Rows::publishChange(const Row& row, const Call& call) {
-    events_.publish("request", jsonObject({{"api", row.api},
-                                           {"version", row.version},
-                                           {"method", row.method},
-                                           {"actor", call.principal.actor},
-                                           {"request_id", call.id}}));
-}
-
-void Rows::logOutcome(const Row& row, const Outcome& outcome, int status, const Call& call) {
+void Rows::note(const Row& row, const Outcome& outcome, int status, const Call& call) {
+    metrics_.countRequest(row, outcome);
     for (const std::string& line : outcome.logLines) {
         log_.write(call.id, "module: " + line);
     }
@@ -123,9 +119,6 @@ void Rows::logOutcome(const Row& row, const Outcome& outcome, int status, const 
     }
     if (!outcome.platform.sentence.empty()) {
         log_.write(call.id, "platform: " + outcome.platform.sentence);
-    }
-    if (!outcome.down.empty()) {
-        log_.write(call.id, sentenceOf(outcome.down));
     }
     log_.write(call.id, row.name() + " for " + call.principal.actor + " at " + call.principal.address + ": " +
                             std::to_string(status) + " in " + milliseconds(outcome.seconds));

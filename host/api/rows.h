@@ -2,10 +2,9 @@
 #ifndef VELT_HOST_API_ROWS_H
 #define VELT_HOST_API_ROWS_H
 
-#include "host/api/events.h"
+#include "host/api/changes.h"
 #include "host/api/metrics.h"
 #include "host/api/openapi.h"
-#include "host/api/revision.h"
 #include "host/api/route.h"
 #include "host/base/host_log.h"
 #include "host/module/module_table.h"
@@ -20,7 +19,7 @@ namespace velt::host {
 class Rows {
 public:
     /// All of these outlive it.
-    Rows(const ModuleTable& table, const OpenApi& openApi, Metrics& metrics, EventHub& events, HostLog& log);
+    Rows(const ModuleTable& table, const OpenApi& openApi, Metrics& metrics, Changes& changes, HostLog& log);
 
     /// It outlives its routes.
     std::vector<Route> routes();
@@ -28,18 +27,15 @@ public:
 private:
     HttpResponse list() const;
     HttpResponse call(const Row& row, const Call& call);
-    HttpResponse callAndAnswer(const Row& row, const Json::Value& parameters, const Call& call);
-    std::vector<ServiceDown> startWhatIsDown(const Principal& principal);
-    void countStarts(const PlatformReport& platform);
-    void publishChange(const Row& row, const Call& call);
-    void logOutcome(const Row& row, const Outcome& outcome, int status, const Call& call);
+    HttpResponse read(const Row& row, const Json::Value& parameters, const Call& call);
+    HttpResponse change(const Row& row, const Json::Value& parameters, const Call& call);
+    void note(const Row& row, const Outcome& outcome, int status, const Call& call);
 
     const ModuleTable& table_;
     const OpenApi& openApi_;
     Metrics& metrics_;
-    EventHub& events_;
+    Changes& changes_;
     HostLog& log_;
-    Revision revision_;
 };
 
 } // namespace velt::host

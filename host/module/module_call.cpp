@@ -45,9 +45,9 @@ Outcome callRow(const Row& row, const Json::Value& parameters, const std::string
     Response response;
     const ModuleLog log;
     const auto start = std::chrono::steady_clock::now();
-    PlatformRequest platform(actor, address);
+    const PlatformRequest platform(actor, address);
     outcome.defect = run(row, request, response);
-    outcome.platform = platform.finish();
+    outcome.platform = PlatformRequest::report();
     outcome.seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
     outcome.logLines = log.lines();
     judge(response, outcome);

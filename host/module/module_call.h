@@ -23,8 +23,8 @@ struct Outcome {
     Json::Value data;
     std::string defect;
     std::vector<std::string> logLines;
-    PlatformReport platform;
-    std::vector<ServiceDown> down; ///< after a change that the module has accepted
+    PlatformReport platform; ///< of a failure
+    bool takenBack = false;  ///< it succeeded, and what it asked for could not be done
     double seconds = 0;
 };
 

@@ -12,6 +12,7 @@ TEST_F(CallTest, AnAnswerIsShownAsJson) {
 }
 
 TEST_F(CallTest, ParametersAreSentAsTheyAre) {
+    host.answerWith(sftpSet, HttpReply{204, "", "", false, false});
     const RunResult result =
         run({"call", sftpApi, "1", "set", R"({"enable": true, "portnum": [1, null, "ü"]})"});
     EXPECT_EQ(result.code, 0) << result.err;

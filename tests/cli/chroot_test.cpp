@@ -66,32 +66,35 @@ TEST_F(ChrootTest, RulesAreShown) {
 TEST_F(ChrootTest, ARuleIsAddedToTheOthers) {
     const RunResult result = run({"chroot", "rules", "add", "user", "ben", "/home"});
     EXPECT_EQ(result.code, 0) << result.err;
-    EXPECT_EQ(result.out, "TYPE   NAME   FOLDER\n"
-                          "user   anna   /docs\n"
-                          "group  staff  /gone\n"
-                          "user   ben    /home\n");
-    EXPECT_EQ(sent(rulesSave).at(0)["rules"], jsonOf(R"([{"type": "user", "name": "anna", "path": "/docs"},
-                                                         {"type": "group", "name": "staff", "path": "/gone"},
-                                                         {"type": "user", "name": "ben", "path": "/home"}])"));
+    EXPECT_EQ(result.out, "chroot_rules: add user ben /home\n");
+    EXPECT_EQ(sent(change).at(0)["chroot_rules"],
+              jsonOf(R"([{"type": "user", "name": "anna", "path": "/docs"},
+                         {"type": "group", "name": "staff", "path": "/gone"},
+                         {"type": "user", "name": "ben", "path": "/home"}])"));
+    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", "/docs"}).out, "Nothing changed.\n");
+    EXPECT_EQ(run({"chroot", "rules", "remove", "user", "ben", "--dry-run"}).code, 7);
+    EXPECT_EQ(host.rules.size(), 3U);
 }
 
-TEST_F(ChrootTest, ARuleThatIsThereIsNotStoredAgain) {
-    EXPECT_EQ(run({"chroot", "rules", "add", "user", "anna", "/docs"}).code, 0);
-    EXPECT_TRUE(sent(rulesSave).empty());
+TEST_F(ChrootTest, ARuleOfSomebodyElseInBetweenIsKept) {
+    host.etag = "\"a-1\"";
+    host.outdated = 1; // somebody else adds a rule first
+    EXPECT_EQ(run({"chroot", "rules", "add", "group", "staff", "/home"}).code, 0);
+    EXPECT_EQ(host.rules.size(), 4U);
+    EXPECT_EQ(host.conditions, (std::vector<std::string>{"\"a-1\"", "\"a-1\""}));
+    host.outdated = 1000;
+    const RunResult result = run({"chroot", "rules", "add", "user", "ben", "/home"});
+    EXPECT_EQ(result.code, 4);
+    EXPECT_EQ(result.err, "veltctl: Others keep changing the settings at the same time.\n"
+                          "  Nothing was changed.\n"
+                          "What to do: Try again later.\n");
 }
 
 TEST_F(ChrootTest, ARuleForAnUnknownUserIsReported) {
     const RunResult result = run({"chroot", "rules", "add", "user", "nobody-knows", "/docs"});
     EXPECT_EQ(result.code, 3);
-    EXPECT_NE(result.err.find("left out: user nobody-knows /docs"), std::string::npos) << result.err;
-    EXPECT_NE(result.err.find("as they were before"), std::string::npos) << result.err;
+    EXPECT_NE(result.err.find("expected a user that exists"), std::string::npos) << result.err;
     EXPECT_EQ(host.rules.size(), 2U);
-    EXPECT_EQ(
-        run({"chroot", "rules", "save", "-"},
-            R"([{"type": "user", "name": "ben", "path": "/home"}, {"type": "user", "name": "x", "path": "/home"}])")
-            .code,
-        3);
-    EXPECT_EQ(jsonOf(run({"chroot", "rules", "load", "--json"}).out)["rules"][0]["name"], "anna");
 }
 
 TEST_F(ChrootTest, ARuleThatTheServerWouldMisreadIsNotSent) {
@@ -109,9 +112,10 @@ TEST_F(ChrootTest, ARuleThatTheServerWouldMisreadIsNotSent) {
 TEST_F(ChrootTest, RulesAreRemovedByNameOrByFolder) {
     EXPECT_EQ(run({"chroot", "rules", "remove", "user", "anna", "/other"}).code, 3);
     EXPECT_EQ(run({"chroot", "rules", "remove", "group", "anna"}).code, 3);
-    EXPECT_TRUE(sent(rulesSave).empty());
+    EXPECT_TRUE(sent(change).empty());
     EXPECT_EQ(run({"chroot", "rules", "remove", "group", "staff", "/gone"}).code, 0);
-    EXPECT_EQ(jsonOf(run({"chroot", "rules", "remove", "user", "anna", "--json"}).out)["rules"].size(), 0U);
+    EXPECT_EQ(run({"chroot", "rules", "remove", "user", "anna"}).out,
+              "chroot_rules: remove user anna /docs\n");
     EXPECT_EQ(host.rules.size(), 0U);
 }
 

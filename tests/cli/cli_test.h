@@ -67,9 +67,7 @@ std::vector<CommandDescription> describeCommands();
 RunResult runProcess(const std::vector<std::string>& arguments, const std::vector<std::string>& environment);
 
 inline constexpr const char* ftpGet = "GET /api/VELT.Core.FileServ.FTP/v3/get";
-inline constexpr const char* ftpSet = "POST /api/VELT.Core.FileServ.FTP/v3/set";
-inline constexpr const char* securitySet = "POST /api/VELT.Core.FileServ.FTP.Security/v1/set";
+inline const std::string change = "PATCH /api/settings";
 inline constexpr const char* sftpSet = "POST /api/VELT.Core.FileServ.FTP.SFTP/v1/set";
-inline constexpr const char* rulesSave = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v2/save";
 
 #endif

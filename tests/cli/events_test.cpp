@@ -16,7 +16,7 @@ constexpr const char* stream =
     ": hello\n\n"
     "event: service\ndata: {\"service\": \"ftpd\", \"action\": \"start\"}\n\n"
     "event: log\ndata: {\"event\": \"0x11B00002\", \"text\": \"FTP on\", \"actor\": \"root\"}\n\n"
-    "event: request\ndata: {\"api\": \"A\", \"version\": 3, \"method\": \"set\", \"actor\": "
+    "event: change\ndata: {\"way\": \"A v3 set\", \"id\": 4, \"actor\": "
     "\"root\", \"request_id\": \"r1\"}\n\n"
     "event: other\ndata: plain \x1b[31m\n\n";
 
@@ -89,7 +89,7 @@ TEST_F(EventsTest, EachKindIsDescribedOnOneLine) {
     const RunResult result = run({"events", "--count", "4"});
     EXPECT_EQ(result.code, 0) << result.err;
     for (const char* line : {"Z  service  ftpd: start\n", "Z  log  0x11B00002 FTP on (root)\n",
-                             "Z  request  A v3 set by root (r1)\n", "Z  other  plain \\x1b[31m\n"}) {
+                             "Z  change  A v3 set by root (change 4)\n", "Z  other  plain \\x1b[31m\n"}) {
         EXPECT_NE(result.out.find(line), std::string::npos) << line << "\n" << result.out;
     }
 }
@@ -100,8 +100,8 @@ TEST_F(EventsTest, OneKindIsShownAlone) {
     EXPECT_EQ(result.code, 0) << result.err;
     EXPECT_NE(result.out.find("  log  0x11B00002"), std::string::npos) << result.out;
     EXPECT_EQ(result.out.find("service"), std::string::npos) << result.out;
-    result = run({"events", "--count", "2", "--kind", "log,request"});
-    EXPECT_NE(result.out.find("  request  "), std::string::npos) << result.out;
+    result = run({"events", "--count", "2", "--kind", "log,change"});
+    EXPECT_NE(result.out.find("  change  "), std::string::npos) << result.out;
     EXPECT_EQ(run({"events", "--kind", "other"}).code, 2);
 }
 

@@ -11,7 +11,7 @@ protected:
     }
 
     int codeAfter(int status) {
-        host.answerWith(ftpSet, problemReply(status, R"({"title": "A title", "request_id": "r-1"})"));
+        host.answerWith(change, problemReply(status, R"({"title": "A title", "request_id": "r-1"})"));
         return codeOf({"ftp", "set", "portnum=2121"});
     }
 
@@ -69,7 +69,7 @@ TEST_F(ExitCodesTest, ThePlatformFailed) {
     EXPECT_NE(last.err.find("request id r-1"), std::string::npos);
     EXPECT_NE(last.err.find("may be in effect"), std::string::npos);
     EXPECT_EQ(codeAfter(503), 5);
-    host.answerWith(ftpSet, problemReply(500, R"({"title": "Failed", "changed": false})"));
+    host.answerWith(change, problemReply(500, R"({"title": "Failed", "changed": false})"));
     EXPECT_EQ(codeOf({"ftp", "set", "portnum=2121"}), 5);
     EXPECT_EQ(last.err.find("may be in effect"), std::string::npos) << last.err;
 }
@@ -107,7 +107,7 @@ TEST_F(ExitCodesTest, AFullOutputIsAnError) {
 }
 
 TEST_F(ExitCodesTest, AShareThatCannotBeReachedIsAConflictOfItsOwn) {
-    host.answerWith(securitySet, problemReply(409, R"({"title": "Not reachable", "code": 1905})"));
+    host.answerWith(change, problemReply(409, R"({"title": "Not reachable", "code": 1905})"));
     EXPECT_EQ(codeOf({"security", "set", "anonymous_chroot=on"}), 4);
     EXPECT_NE(last.err.find("veltctl shares"), std::string::npos) << last.err;
 }
@@ -115,7 +115,7 @@ TEST_F(ExitCodesTest, AShareThatCannotBeReachedIsAConflictOfItsOwn) {
 TEST_F(ExitCodesTest, AProblemOfAnyFormIsReported) {
     for (const char* body : {"", "<html>", "[]", R"({"errors": 5, "title": {"a": 1}, "code": null})",
                              R"({"errors": [5, {"field": 7}]})"}) {
-        host.answerWith(ftpSet, problemReply(422, body));
+        host.answerWith(change, problemReply(422, body));
         EXPECT_EQ(codeOf({"ftp", "set", "portnum=1"}), 3) << body;
         EXPECT_NE(last.err.find("HTTP 422"), std::string::npos) << body;
     }

@@ -22,12 +22,6 @@ std::string ifMatchOf(const HttpRequest& request) {
                : request.head.substr(begin + 10, request.head.find('\r', begin) - begin - 10);
 }
 
-HttpReply noContent() {
-    HttpReply reply;
-    reply.status = 204;
-    return reply;
-}
-
 Json::Value storedRules(const Json::Value& rules) {
     Json::Value answer;
     answer["rules"] = Json::Value(Json::arrayValue);
@@ -89,99 +83,86 @@ HttpReply FakeHost::answer(const HttpRequest& request) {
     if (scripted != scripted_.end()) {
         return scripted->second;
     }
-    if (outdated > 0 && request.method == "POST" && !etag.empty()) {
+    const bool changes = request.method == "POST" || request.method == "PATCH";
+    if (outdated > 0 && changes && !etag.empty()) {
         --outdated;
         conditions.push_back(ifMatchOf(request));
-        ftp["enable_ftps"] = true;
+        rules.append(jsonOf(R"({"type": "user", "name": "ben", "path": "/docs"})"));
         return problemReply(412, R"({"title": "Precondition Failed"})");
     }
-    if (request.method != "GET" && request.method != "POST") {
+    if (request.method != "GET" && !changes) {
         return problemReply(405, R"({"title": "Method not allowed"})");
     }
-    if (request.method == "POST" && !etag.empty()) {
+    if (changes && !etag.empty()) {
         conditions.push_back(ifMatchOf(request));
     }
-    HttpReply reply = callMethod(request.target, request.body.empty() ? Json::Value(Json::objectValue)
-                                                                      : jsonOf(request.body));
+    const Json::Value body = request.body.empty() ? Json::Value(Json::objectValue) : jsonOf(request.body);
+    HttpReply reply = request.method == "PATCH" ? patch(request.target, body) : callMethod(request.target);
     reply.etag = etag;
     return reply;
 }
 
-HttpReply FakeHost::callMethod(const std::string& row, const Json::Value& parameters) {
-    if (row == "/api/status") {
-        return jsonReply(status());
+HttpReply FakeHost::callMethod(const std::string& row) {
+    if (row == "/api/settings") {
+        return jsonReply(document());
     }
     const std::string api = "/api/VELT.Core.FileServ.FTP";
-    const std::set<std::string> ftpRequired = {"enable_ftp", "enable_ftps"};
     if (row == api + "/v3/get" || row == api + "/v2/get" || row == api + "/v1/get") {
         return jsonReply(ftp);
-    }
-    if (row == api + "/v3/set" || row == api + "/v2/set" || row == api + "/v1/set") {
-        return set(ftp, parameters, ftpRequired);
     }
     if (row == api + ".Security/v1/get") {
         return jsonReply(security);
     }
-    if (row == api + ".Security/v1/set") {
-        return set(security, parameters, {});
-    }
     if (row == api + ".SFTP/v1/get") {
         return jsonReply(sftp);
-    }
-    if (row == api + ".SFTP/v1/set") {
-        return set(sftp, parameters, {"enable"});
     }
     if (row == api + ".ChrootUser/v2/load") {
         return jsonReply(storedRules(rules));
     }
-    if (row == api + ".ChrootUser/v2/save") {
-        return saveRules(parameters);
-    }
     return problemReply(404, R"({"title": "No such method", "detail": "The server has no such row."})");
 }
 
-Json::Value FakeHost::status() const {
-    Json::Value answer = jsonOf(R"({"version": "1.0.0", "uptime_seconds": 1})");
-    for (const std::string name : {"ftp", "ftps", "sftp"}) {
-        Json::Value service;
-        service["name"] = name;
-        service["enabled"] = name == "sftp" ? sftp["enable"] : ftp["enable_" + name];
-        if (tellsWanted) {
-            service["wanted"] = down.count(name) != 0 || service["enabled"].asBool();
-        }
-        answer["services"].append(service);
-    }
-    return answer;
+Json::Value FakeHost::document() const {
+    Json::Value whole = jsonOf(R"({"format": "velt-settings", "format_version": 1})");
+    whole["ftp"] = ftp;
+    whole["security"] = security;
+    whole["sftp"] = sftp;
+    whole["chroot_rules"] = rules;
+    return whole;
 }
 
-HttpReply FakeHost::set(Json::Value& settings, const Json::Value& parameters,
-                        const std::set<std::string>& required) {
-    for (const std::string& key : required) {
-        if (!parameters[key].isBool()) {
+HttpReply FakeHost::patch(const std::string& target, const Json::Value& patch) {
+    Json::Value answer = report;
+    answer["dry_run"] = target.find("dry_run=true") != std::string::npos;
+    answer["changes"] = Json::Value(Json::arrayValue);
+    const auto put = [&](const std::string& field, Json::Value& place, const Json::Value& value) {
+        if (place == value) {
+            return;
+        }
+        Json::Value change;
+        change["field"] = field;
+        change["from"] = place;
+        change["to"] = value;
+        answer["changes"].append(change);
+        if (answer["dry_run"] == false) {
+            place = value;
+        }
+    };
+    for (const Json::Value& rule : patch["chroot_rules"]) {
+        if (accounts.count(rule["name"].asString()) == 0) {
             return problemReply(
-                422, R"({"title": "A parameter is missing", "code": 1901, "errors": [{"field": ")" + key +
-                         R"(", "expected": "true or false"}]})");
+                422, R"({"detail": "/chroot_rules: expected a user that exists.", "changed": false})");
         }
     }
-    // The server passes over a range without its switch, and refuses a switch without a range.
-    const bool ranged = parameters["custom_port_range"] == true;
-    if (ranged && !parameters.isMember("custom_port")) {
-        return problemReply(422, R"({"title": "No range", "code": 1901})");
+    if (patch.isMember("chroot_rules")) {
+        put("/chroot_rules", rules, patch["chroot_rules"]);
     }
-    for (const std::string& key : parameters.getMemberNames()) {
-        if (key != "custom_port" || ranged) {
-            settings[key] = parameters[key] == " " ? Json::Value("") : parameters[key];
+    for (auto& [name, section] :
+         std::map<std::string, Json::Value*>{{"ftp", &ftp}, {"security", &security}, {"sftp", &sftp}}) {
+        for (const std::string& key :
+             patch[name].isObject() ? patch[name].getMemberNames() : std::vector<std::string>{}) {
+            put("/" + name + "/" + key, (*section)[key], patch[name][key]);
         }
     }
-    return noContent();
-}
-
-HttpReply FakeHost::saveRules(const Json::Value& parameters) {
-    rules = Json::Value(Json::arrayValue);
-    for (const Json::Value& rule : parameters["rules"]) {
-        if (accounts.count(rule["name"].asString()) != 0) {
-            rules.append(rule);
-        }
-    }
-    return noContent();
+    return jsonReply(answer);
 }

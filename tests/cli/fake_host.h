@@ -32,19 +32,16 @@ public:
     Json::Value rules{Json::arrayValue};
     Json::Value chrootUsers{Json::arrayValue};
     std::set<std::string> accounts{"anna", "ben", "staff"};
-    std::set<std::string> down; ///< services that are shown as off and are switched on: ftp, ftps, sftp
-    std::string etag;           ///< of every answer; empty for none
-    int outdated = 0;           ///< so many sets of the FTP settings come too late
-    std::vector<std::string> conditions; ///< their If-Match
-    bool tellsWanted = true;             ///< the status says what is switched on
+    Json::Value report{Json::objectValue}; ///< what the answer to a change says beside the changes
+    std::string etag;                      ///< of every answer; empty for none
+    int outdated = 0;                      ///< so many changes come too late
+    std::vector<std::string> conditions;   ///< their If-Match
 
 private:
     HttpReply answer(const HttpRequest& request);
-    HttpReply set(Json::Value& settings, const Json::Value& parameters,
-                  const std::set<std::string>& required);
-    Json::Value status() const;
-    HttpReply saveRules(const Json::Value& parameters);
-    HttpReply callMethod(const std::string& row, const Json::Value& parameters);
+    Json::Value document() const;
+    HttpReply patch(const std::string& target, const Json::Value& patch);
+    HttpReply callMethod(const std::string& row);
 
     std::shared_ptr<std::mutex> mutex_ = std::make_shared<std::mutex>();
     std::map<std::string, HttpReply> scripted_;

@@ -55,13 +55,17 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "chroot users add",
                             "chroot users delete",
                             "chroot users list",
+                            "confirm",
+                            "doctor",
                             "events",
                             "export",
                             "ftp",
                             "ftp get",
                             "ftp set",
+                            "history",
                             "import",
                             "log",
+                            "restart",
                             "security",
                             "security get",
                             "security set",
@@ -73,17 +77,18 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "tokens",
                             "tokens create",
                             "tokens delete",
-                            "tokens list"}));
+                            "tokens list",
+                            "undo"}));
 }
 
 TEST_F(ProgramTest, BothTransportsCarryTheSameRequests) {
     EXPECT_EQ(run({"sftp", "set", "enable=on"}).code, 0);
     environment = {{"VELT_URL", server.url()}};
     EXPECT_EQ(run({"sftp", "set", "enable=off"}).code, 0);
-    ASSERT_EQ(sent(sftpSet).size(), 2U);
+    ASSERT_EQ(sent(change).size(), 2U);
     for (const HttpRequest& request : server.requests()) {
         const bool hasType = request.head.find("Content-Type: application/json\r\n") != std::string::npos;
-        EXPECT_EQ(hasType, request.method == "POST") << request.head;
+        EXPECT_EQ(hasType, request.method == "PATCH") << request.head;
         EXPECT_EQ(request.head.find("Expect:"), std::string::npos);
     }
 }

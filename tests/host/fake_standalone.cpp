@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <memory>
 #include <mutex>
 #include <set>
 #include <utility>
@@ -17,8 +18,6 @@ std::mutex mutex;
 
 /// The calling thread's request.
 struct Request {
-    velt::EffectReport report;
-    std::size_t journalStart = 0;
     std::string sentence = "The last error is that of an earlier request.";
 };
 
@@ -61,19 +60,58 @@ void tellSubscribers(Effect effect) {
     }
 }
 
-/// Tells of all that the request has done, at its end.
-void reportEffects(const Request& ended) {
+/// What the calls of the contract since then would be steps of a change for.
+velt::ChangeSteps stepsSince(std::size_t start) {
     const auto& journal = fake::Platform::instance().journal;
-    for (std::size_t i = ended.journalStart; i < journal.size(); ++i) {
-        if (const auto effect = effectOf(fake::Platform::operationOf(journal[i]))) {
-            ended.report(*effect, "sftp", velt::Result<>(), {});
-            tellSubscribers(*effect);
+    velt::ChangeSteps steps;
+    for (std::size_t i = start; i < journal.size(); ++i) {
+        const auto effect = effectOf(fake::Platform::operationOf(journal[i]));
+        if (effect == Effect::store || effect == Effect::runKey) {
+            steps.push_back({velt::StepKind::store, "settings"});
+        } else if (effect == Effect::start || effect == Effect::stop) {
+            steps.push_back(
+                {*effect == Effect::start ? velt::StepKind::start : velt::StepKind::stop, "sftp"});
         }
     }
-    if (FakeStandalone::instance().storeFails) {
-        ended.report(Effect::store, "settings", velt::Error("Refused."), {});
-    }
+    return steps;
 }
+
+/// The fake platform takes each call at once; what is not committed is taken back.
+class FakeChange final : public velt::SettingsChange {
+public:
+    ~FakeChange() override {
+        if (!committed_) {
+            static_cast<fake::State&>(fake::Platform::instance()) = before_;
+        }
+    }
+
+    velt::Result<velt::ChangeOutcome> plan(velt::SessionPolicy policy) override {
+        return velt::ChangeOutcome{steps(), std::nullopt, true, ended(policy)};
+    }
+
+    velt::ChangeOutcome commit(velt::SessionPolicy policy) override {
+        FakeStandalone& fake = FakeStandalone::instance();
+        if (fake.commitFails) {
+            return {{}, velt::Error(fake.commitError, fake.sentence), fake.undone};
+        }
+        committed_ = true;
+        const auto& journal = fake::Platform::instance().journal;
+        for (std::size_t i = start_; i < journal.size(); ++i) {
+            if (const auto effect = effectOf(fake::Platform::operationOf(journal[i]))) {
+                tellSubscribers(*effect);
+            }
+        }
+        return {steps(), std::nullopt, true, ended(policy)};
+    }
+
+private:
+    velt::ChangeSteps steps() const { return stepsSince(start_); }
+    static int ended(velt::SessionPolicy policy) { return policy == velt::SessionPolicy::keep ? 0 : 3; }
+
+    const fake::State before_ = fake::Platform::instance();
+    const std::size_t start_ = fake::Platform::instance().journal.size();
+    bool committed_ = false;
+};
 
 } // namespace
 
@@ -90,6 +128,15 @@ void FakeStandalone::announce(const std::string& service, const std::string& act
 }
 
 namespace velt {
+
+Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service) {
+    FakeStandalone& fake = FakeStandalone::instance();
+    fake.askedRestarts.push_back(std::string(service) + (policy == SessionPolicy::end ? " end" : " keep"));
+    if (fake.restartFails) {
+        return Error(fake.sentence);
+    }
+    return fake.sessions;
+}
 
 ServiceRequest::ServiceRequest(SessionPolicy) {}
 
@@ -174,13 +221,86 @@ void setRequestActor(const std::string& actor, const std::string& address) {
     }
 }
 
-void setEffectReport(EffectReport report) {
-    const std::lock_guard lock(mutex);
-    const Request ended = std::exchange(
-        request(), {std::move(report), fake::Platform::instance().journal.size(), request().sentence});
-    if (ended.report) {
-        reportEffects(ended);
+const RequestActor& requestActor() {
+    thread_local RequestActor actor;
+    return actor;
+}
+
+ErrorNumber lastErrorNumber() {
+    return FakeStandalone::instance().error;
+}
+
+Result<std::unique_ptr<SettingsChange>> SettingsChange::begin(const IntendedPorts& ports) {
+    FakeStandalone::instance().intended = ports;
+    return std::unique_ptr<SettingsChange>(std::make_unique<FakeChange>());
+}
+
+std::string_view stepName(StepKind kind) {
+    switch (kind) {
+    case StepKind::store:
+        return "store";
+    case StepKind::start:
+        return "start";
+    default:
+        return "stop";
     }
+}
+
+Result<> logEvent(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
+    LogEntry entry;
+    entry.category = category;
+    entry.level = level;
+    entry.event = event;
+    for (std::size_t i = 0; i < texts.size(); ++i) {
+        entry.texts[i] = texts[i] == nullptr ? "" : texts[i];
+    }
+    FakeStandalone& fake = FakeStandalone::instance();
+    fake.audit.push_back(entry.texts[0] + ": " + entry.texts[1]);
+    return fake.logFails ? Result<>(Error(fake.sentence)) : Result<>();
+}
+
+std::string changeStateName(ChangeState state) {
+    constexpr std::array<const char*, 4> names{"done", "waiting", "confirmed", "undone"};
+    return names.at(static_cast<std::size_t>(state));
+}
+
+Result<std::int64_t> recordChange(const ChangeRecord& change) {
+    FakeStandalone& fake = FakeStandalone::instance();
+    const std::lock_guard lock(mutex);
+    if (fake.historyFails) {
+        return Error(fake.sentence);
+    }
+    fake.history.push_back(change);
+    fake.history.back().id = static_cast<std::int64_t>(fake.history.size());
+    return fake.history.back().id;
+}
+
+Result<> setChangeState(std::int64_t id, ChangeState state) {
+    const std::lock_guard lock(mutex);
+    FakeStandalone::instance().history.at(static_cast<std::size_t>(id) - 1).state = state;
+    return {};
+}
+
+Result<std::vector<ChangeRecord>> queryChanges(const ChangeFilter& filter) {
+    const std::lock_guard lock(mutex);
+    const FakeStandalone& fake = FakeStandalone::instance();
+    std::vector<ChangeRecord> found;
+    for (auto change = fake.history.rbegin(); change != fake.history.rend(); ++change) {
+        const bool wanted = (!filter.beforeId || change->id < *filter.beforeId) &&
+                            (!filter.state || change->state == *filter.state);
+        if (wanted && found.size() < static_cast<std::size_t>(filter.limit)) {
+            found.push_back(*change);
+        }
+    }
+    return found;
+}
+
+Result<std::optional<ChangeRecord>> changeRecord(std::int64_t id) {
+    const std::lock_guard lock(mutex);
+    const auto& history = FakeStandalone::instance().history;
+    return id >= 1 && static_cast<std::size_t>(id) <= history.size()
+               ? std::optional(history[static_cast<std::size_t>(id) - 1])
+               : std::nullopt;
 }
 
 Subscription subscribeEvents(EventSubscriber subscriber) {

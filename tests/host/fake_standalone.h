@@ -13,16 +13,25 @@
 struct FakeStandalone {
     velt::EventSubscriber eventSubscriber;
     velt::LogSubscriber logSubscriber;
-    std::vector<velt::LogEntry> log; ///< oldest first
-    int largestLimit = 0;            ///< that the log was asked for
-    bool logFails = false;           ///< with `sentence`
-    std::string sentence;            ///< of the last error of the requests to come
-    velt::PortConflict conflict;     ///< that is found
-    bool storeFails = false;
-    bool settingsFail = false;           ///< those of the services cannot be read
-    std::vector<velt::ServiceDown> down; ///< services that are switched on and do not run
-    bool startHelps = false;             ///< and run once they are started
-    int starts = 0;                      ///< how often the host started what is switched on
+    std::vector<velt::LogEntry> log;                   ///< oldest first
+    int largestLimit = 0;                              ///< that the log was asked for
+    bool logFails = false;                             ///< with `sentence`
+    std::string sentence;                              ///< of the last error of the requests to come
+    velt::PortConflict conflict;                       ///< that is found
+    velt::ErrorNumber error = velt::ErrorNumber::none; ///< the kind of the last error
+    bool commitFails = false;                          ///< of the next changes, with `sentence`
+    velt::ErrorNumber commitError = velt::ErrorNumber::daemon;
+    bool undone = true;                      ///< what was done of a change that failed
+    velt::IntendedPorts intended;            ///< of the last change
+    std::vector<velt::ChangeRecord> history; ///< oldest first
+    std::vector<std::string> askedRestarts;  ///< "SERVICE POLICY" of each that was asked for
+    bool restartFails = false;               ///< with `sentence`
+    bool historyFails = false;               ///< with `sentence`
+    std::vector<std::string> audit;          ///< "WAY: WHAT" of the host's own log entries
+    bool settingsFail = false;               ///< those of the services cannot be read
+    std::vector<velt::ServiceDown> down;     ///< services that are switched on and do not run
+    bool startHelps = false;                 ///< and run once they are started
+    int starts = 0;                          ///< how often the host started what is switched on
     std::map<std::string, std::uint64_t> restarts;
     velt::Findings findings;                     ///< of the judgements to come
     int judgements = 0;                          ///< how many were made

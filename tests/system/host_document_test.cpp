@@ -50,12 +50,14 @@ TEST_F(HostDocument, bringsBackEverySetting) {
     const std::string changed = exported();
     expectAllDifferent(jsonOf(before), jsonOf(changed));
 
-    const std::string plan = done({"import", "--dry-run", "-"}, before);
-    EXPECT_TRUE(contains(plan, "ftp  ext_ip: 203.0.113.7 -> (empty)\n")) << plan;
+    const ProcessResult plan = veltctl({"import", "--dry-run", "-"}, before);
+    EXPECT_EQ(plan.exitCode, 7) << plan.errors;
+    EXPECT_TRUE(contains(plan.output, "ftp/ext_ip: 203.0.113.7 -> (empty)\n")) << plan.output;
+    EXPECT_TRUE(contains(plan.output, "  stores the ftp settings\n")) << plan.output;
     EXPECT_EQ(exported(), changed) << "a dry run";
     done({"import", "-"}, before);
     EXPECT_EQ(exported(), before);
-    EXPECT_EQ(done({"import", "-"}, before), "Nothing to change.\n");
+    EXPECT_EQ(done({"import", "-"}, before), "Nothing changed.\n");
     done({"import", "-"}, changed);
     EXPECT_EQ(exported(), changed);
     EXPECT_EQ(fetchHome(2001), "");
@@ -63,20 +65,18 @@ TEST_F(HostDocument, bringsBackEverySetting) {
     EXPECT_EQ(exported(), before);
 }
 
-TEST_F(HostDocument, aRefusedSectionIsNamedWithThoseThatWereApplied) {
-    Json::Value document = jsonOf(exported());
+TEST_F(HostDocument, aRefusedPartRefusesAll) {
+    const std::string before = exported();
+    Json::Value document = jsonOf(before);
     document["security"]["anonymous"] = true;
-    document["ftp"]["ext_ip"] = "gateway";
+    document["ftp"]["portnum"] = 2233;
     document["sftp"]["portnum"] = 2233;
+    document["ftp"]["enable_ftp"] = true;
+    document["sftp"]["enable"] = true;
     const ProcessResult result = veltctl({"import", "-"}, textOf(document));
-    EXPECT_EQ(result.exitCode, 5);
-    for (const char* text :
-         {"The external address is \"gateway\"", "ftp: failed", "security: applied", "sftp: not applied"}) {
-        EXPECT_TRUE(contains(result.errors, text)) << result.errors;
-    }
-    const Json::Value now = jsonOf(exported());
-    EXPECT_EQ(now["security"]["anonymous"], true);
-    EXPECT_EQ(now["sftp"]["portnum"], 2222);
+    EXPECT_EQ(result.exitCode, 3);
+    EXPECT_TRUE(contains(result.errors, "/ftp/portnum: expected another port than SFTP's")) << result.errors;
+    EXPECT_EQ(exported(), before);
 }
 
 } // namespace

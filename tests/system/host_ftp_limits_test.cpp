@@ -141,13 +141,5 @@ TEST_F(HostFtpLimits, fileNamesAndContents) {
     });
 }
 
-TEST_F(HostFtpLimits, aValueThatIsPassedOverIsTold) {
-    // Off cannot be while sessions start in UTF-8.
-    const ProcessResult result = veltctl({"ftp", "set", "--api-version", "1", "enable_utf8=off"});
-    EXPECT_EQ(result.exitCode, 0);
-    EXPECT_EQ(result.output, "Nothing changed.\n");
-    EXPECT_TRUE(contains(result.errors, "accepted enable_utf8=off, but shows on")) << result.errors;
-}
-
 } // namespace
 } // namespace velt::test

@@ -41,10 +41,10 @@ TEST_F(HostEvents, EventsTellWhatAChangeDid) {
     start();
     Client events = listen();
     EXPECT_EQ(post(sftpSet, R"({"enable":true,"portnum":2222})").status, 204);
-    std::string text = events.readUntil("event: request\n");
+    std::string text = events.readUntil("event: change\n");
     text += events.readUntil("\n\n");
     EXPECT_NE(text.find("event: log\ndata: {"), std::string::npos) << text;
-    EXPECT_NE(text.find(R"("method":"set")"), std::string::npos) << text;
+    EXPECT_NE(text.find(R"("way":"VELT.Core.FileServ.FTP.SFTP v1 set")"), std::string::npos) << text;
     EXPECT_NE(text.find(R"("actor":"admin")"), std::string::npos) << text;
 }
 

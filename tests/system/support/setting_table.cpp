@@ -1,5 +1,7 @@
 #include "tests/system/support/setting_table.h"
 
+#include "schema/settings_table.h"
+
 namespace velt::test {
 namespace {
 
@@ -41,10 +43,11 @@ void SettingTable::checkOne(const SettingCase& setting) const {
 }
 
 void SettingTable::setByVeltctl(const SettingCase& setting, const Json::Value& value) const {
-    Words words{setting.group, "set", setting.key + "=" + wordFor(value)};
-    const Words version = versionWords(setting);
-    words.insert(words.end(), version.begin(), version.end());
-    const ProcessResult result = veltctl(words);
+    if (setting.group == "ftp" && setting.version != schema::ftp.newestApiVersion) {
+        setByCurl(setting, value); // the command line sets the newest version's settings only
+        return;
+    }
+    const ProcessResult result = veltctl({setting.group, "set", setting.key + "=" + wordFor(value)});
     EXPECT_EQ(result.exitCode, 0) << result.errors;
     EXPECT_EQ(result.errors, "");
 }

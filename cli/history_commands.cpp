@@ -1,0 +1,131 @@
+#include "base/json_value.h"
+#include "base/printable.h"
+#include "cli/change_report.h"
+#include "cli/command.h"
+#include "cli/json_io.h"
+#include "cli/text_table.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+#include <ostream>
+#include <string>
+
+namespace velt::cli {
+
+namespace {
+
+struct HistoryOptions {
+    long long id = 0; ///< 0: the newest
+    long long before = 0;
+    int limit = 20;
+    ChangeOptions change;
+};
+
+/// "/ftp/timeout, /ftp/portnum", or "/ftp/timeout and 7 more".
+std::string fieldsOf(const Json::Value& changes) {
+    constexpr Json::ArrayIndex most = 3;
+    std::string text;
+    for (Json::ArrayIndex i = 0; i < changes.size() && i < most; ++i) {
+        text += (i == 0 ? "" : ", ") + textAt(changes[i], "field");
+    }
+    return changes.size() > most ? text + " and " + std::to_string(changes.size() - most) + " more" : text;
+}
+
+void showHistory(Context& context, const HistoryOptions& options) {
+    std::string query = "?limit=" + std::to_string(options.limit);
+    query += options.before > 0 ? "&before=" + std::to_string(options.before) : "";
+    const Json::Value answer = context.api.get("/api/history" + query);
+    if (context.wroteJson(answer)) {
+        return;
+    }
+    Table table({"ID", "TIME", "STATE", "BY", "WITH", "CHANGED"});
+    for (const Json::Value& change : answer["changes"]) {
+        const std::string actor = textAt(change, "actor");
+        table.add({change["id"].asString(), textAt(change, "time"), textAt(change, "state"),
+                   actor.empty() ? "veltd" : actor, textAt(change, "way"), fieldsOf(change["changes"])});
+    }
+    table.write(context.console.out);
+    if (answer["next"].isIntegral()) {
+        context.console.out << "Older ones: veltctl history --before " << answer["next"].asString() << '\n';
+    }
+}
+
+void showChange(Context& context, long long id) {
+    const Json::Value change = context.api.get("/api/history/" + std::to_string(id));
+    if (context.wroteJson(change)) {
+        return;
+    }
+    Table table({"FIELD", "FROM", "TO"});
+    for (const Json::Value& field : change["changes"]) {
+        const auto text = [&](const char* key) {
+            return field[key].isArray() ? compactJson(field[key]) : displayValue(field[key]);
+        };
+        table.add({textAt(field, "field"), text("from"), text("to")});
+    }
+    table.write(context.console.out);
+}
+
+/// The change that is meant: the named one, else the newest that satisfies the condition.
+template<class Condition>
+long long meant(Context& context, long long id, const Condition& condition, const char* what) {
+    if (id > 0) {
+        return id;
+    }
+    const Json::Value answer = context.api.get("/api/history?limit=100");
+    for (const Json::Value& change : answer["changes"]) {
+        if (condition(textAt(change, "state"))) {
+            return change["id"].asInt64();
+        }
+    }
+    throw Failure(ExitCode::refused, std::string("There is no change ") + what + ".",
+                  "'veltctl history' lists the changes.");
+}
+
+void undo(Context& context, const HistoryOptions& options) {
+    const long long id = meant(
+        context, options.id, [](const std::string& state) { return state != "undone"; }, "to undo");
+    const std::string path = "/api/history/" + std::to_string(id) + "/undo" + options.change.query();
+    writeReport(context, context.api.post(path, Json::objectValue));
+}
+
+void confirm(Context& context, const HistoryOptions& options) {
+    const long long id = meant(
+        context, options.id, [](const std::string& state) { return state == "waiting"; }, "to confirm");
+    context.api.post("/api/history/" + std::to_string(id) + "/confirm", Json::objectValue);
+    if (!context.wroteJson(jsonObject({{"confirmed", Json::Int64{id}}}))) {
+        context.console.out << "Change " << id << " stays.\n";
+    }
+}
+
+void addId(CLI::App* command, HistoryOptions& options, const char* text) {
+    command->add_option("id", options.id, text)->check(CLI::PositiveNumber)->type_name("");
+}
+
+} // namespace
+
+void addHistoryCommands(CLI::App& app, Command& chosen) {
+    auto options = std::make_shared<HistoryOptions>();
+    CLI::App* list = app.add_subcommand("history", "Show the changes of the settings, or one of them");
+    addId(list, *options, "Show this change field by field");
+    list->add_option("--before", options->before, "Only changes older than this one")
+        ->check(CLI::PositiveNumber)
+        ->type_name("ID");
+    list->add_option("--limit", options->limit, "Number of changes to show (default 20)")
+        ->check(CLI::Range(1, 1000))
+        ->type_name("N");
+    onWords(list, chosen, [options](Context& context) {
+        options->id > 0 ? showChange(context, options->id) : showHistory(context, *options);
+    });
+
+    CLI::App* back = app.add_subcommand("undo", "Take a change of the settings back");
+    addId(back, *options, "The change that 'veltctl history' shows (default: the newest)");
+    addChangeOptions(back, options->change);
+    onWords(back, chosen, [options](Context& context) { undo(context, *options); });
+
+    CLI::App* keep = app.add_subcommand("confirm", "Keep a change that else is taken back");
+    addId(keep, *options, "The change (default: the newest that waits)");
+    onWords(keep, chosen, [options](Context& context) { confirm(context, *options); });
+}
+
+} // namespace velt::cli

@@ -1,0 +1,208 @@
+#include "host/api/changes.h"
+
+#include "base/json_value.h"
+#include "host/api/problem.h"
+#include "host/api/service_status.h"
+#include "host/base/json.h"
+#include "host/module/platform_request.h"
+
+#include <functional>
+#include <utility>
+
+namespace velt::host {
+
+namespace {
+
+constexpr int logCategory = 2;
+constexpr int logLevel = 1;
+constexpr unsigned changedEvent = 0x11BF0003;
+
+std::string textOf(const Json::Value& value) {
+    return value.isArray() ? std::to_string(value.size()) + " rules" : toJson(value);
+}
+
+/// "/ftp/timeout 300 to 600, /ftp/portnum 21 to 2121"
+std::string summaryOf(const std::vector<FieldChange>& changes) {
+    std::string text;
+    for (const FieldChange& change : changes) {
+        text += (text.empty() ? "" : ", ") + change.field + " from " + textOf(change.from) + " to " +
+                textOf(change.to);
+    }
+    return text;
+}
+
+/// A change that the platform could not do, though the module accepted it.
+HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId) {
+    const bool taken = outcome.failure->number == ErrorNumber::portTaken;
+    const std::string extent = outcome.undone ? " All is as it was before." : "";
+    return problemWith(taken ? 409 : 500,
+                       jsonObject({{"title", outcome.undone ? "The change was taken back"
+                                                            : "The change could be taken back only in part"},
+                                   {"detail", outcome.failure->message + extent},
+                                   {"changed", !outcome.undone}}),
+                       requestId);
+}
+
+Json::Value toObject(const ChangeStep& step) {
+    return jsonObject({{"effect", std::string(stepName(step.kind))}, {"subject", step.subject}});
+}
+
+} // namespace
+
+Json::Value toObject(const ChangeReport& report) {
+    Json::Value object = jsonObject(
+        {{"dry_run", report.dryRun},
+         {"changes", jsonArray(report.changes, [](const FieldChange& each) { return toObject(each); })},
+         {"effects", jsonArray(report.steps, [](const ChangeStep& each) { return toObject(each); })},
+         {"sessions_ended", report.sessionsEnded},
+         {"warnings", jsonArray(report.warnings, std::identity())},
+         {"down", jsonArray(report.down, [](const ServiceDown& each) { return toObject(each); })}});
+    if (report.id) {
+        object["id"] = Json::Int64{*report.id};
+    }
+    return object;
+}
+
+Changes::Changes(const ModuleTable& table, Metrics& metrics, EventHub& events, HostLog& log)
+    : table_(table), metrics_(metrics), events_(events), log_(log) {}
+
+std::variant<ChangeReport, HttpResponse> Changes::make(const ChangeRequest& request, const Ask& ask) {
+    const Call& call = request.call;
+    const PlatformRequest platform(call.principal.actor, call.principal.address);
+    const auto before = readSettingsDocument(table_, call.principal);
+    auto change = SettingsChange::begin(request.ports);
+    if (!change) {
+        return problem(500, change.error().message + " Nothing was changed.", call.id);
+    }
+    if (auto refusal = ask()) {
+        return std::move(*refusal);
+    }
+    ChangeReport report;
+    report.dryRun = request.options.dryRun;
+    const auto after = readSettingsDocument(table_, call.principal);
+    // A request may mend what cannot be read; then there is nothing to compare.
+    if (before && after) {
+        report.changes = differences(*before, *after);
+    }
+    if (auto failure =
+            request.options.dryRun ? preview(**change, request, report) : commit(**change, request, report)) {
+        return std::move(*failure);
+    }
+    return report;
+}
+
+std::optional<HttpResponse> Changes::preview(SettingsChange& change, const ChangeRequest& request,
+                                             ChangeReport& report) {
+    const auto plan = change.plan(request.options.sessions);
+    if (!plan) {
+        return problem(500, plan.error().message + " Nothing was changed.", request.call.id);
+    }
+    report.steps = plan->steps;
+    report.sessionsEnded = plan->sessionsEnded;
+    return std::nullopt;
+}
+
+std::optional<HttpResponse> Changes::commit(SettingsChange& change, const ChangeRequest& request,
+                                            ChangeReport& report) {
+    // First: one that waits for its confirmation has to be found again after a crash.
+    if (request.options.confirmWithin && !report.changes.empty()) {
+        const auto recorded = record(request, ChangeState::waiting, report);
+        if (!recorded) {
+            return problem(500, recorded.error().message + " Nothing was changed.", request.call.id);
+        }
+    }
+    const ChangeOutcome outcome = change.commit(request.options.sessions);
+    report.steps = outcome.steps;
+    report.sessionsEnded = outcome.sessionsEnded;
+    if (outcome.failure) {
+        noteFailure(outcome, request, report);
+        return notDone(outcome, request.call.id);
+    }
+    report.down = startWhatIsDown();
+    if (!report.empty()) {
+        writeDown(request, report);
+        tell(request, report);
+    }
+    return std::nullopt;
+}
+
+void Changes::noteFailure(const ChangeOutcome& outcome, const ChangeRequest& request,
+                          const ChangeReport& report) {
+    log_.write(request.call.id, "platform: " + outcome.failure->message);
+    if (report.id) {
+        (void)setChangeState(*report.id,
+                             ChangeState::undone); // else it is undone once more, which changes nothing
+    }
+    if (!outcome.undone) {
+        revision_.advance();
+    }
+}
+
+Result<> Changes::record(const ChangeRequest& request, ChangeState state, ChangeReport& report) {
+    ChangeRecord change;
+    change.time = std::chrono::floor<std::chrono::milliseconds>(std::chrono::system_clock::now());
+    change.actor = request.call.principal.actor;
+    change.address = request.call.principal.address;
+    change.way = request.way;
+    change.fields = toJson(jsonArray(report.changes, [](const FieldChange& each) { return toObject(each); }));
+    change.state = state;
+    if (request.options.confirmWithin) {
+        change.confirmBy = change.time + *request.options.confirmWithin;
+    }
+    VELT_ASSIGN_OR_RETURN(report.id, recordChange(change));
+    return {};
+}
+
+/// In the history and in the administrator log. The change is done, so a failure is only a warning.
+void Changes::writeDown(const ChangeRequest& request, ChangeReport& report) {
+    if (report.changes.empty()) {
+        return;
+    }
+    if (!report.id) {
+        if (const auto recorded = record(request, ChangeState::done, report); !recorded) {
+            report.warnings.push_back("The change is not in the history. " + recorded.error().message);
+        }
+    }
+    const std::string summary = summaryOf(report.changes);
+    if (const auto logged = logEvent(logCategory, logLevel, changedEvent,
+                                     {request.way.c_str(), summary.c_str(), nullptr, nullptr});
+        !logged) {
+        report.warnings.push_back("The change is not in the administrator log. " + logged.error().message);
+    }
+    for (const std::string& warning : report.warnings) {
+        log_.write(request.call.id, warning);
+    }
+}
+
+/// What an earlier change, or a boot, left down may start by now. That it does not is no failure of this
+/// change.
+std::vector<ServiceDown> Changes::startWhatIsDown() {
+    if (servicesDown().empty()) {
+        return {};
+    }
+    (void)startEnabledServices(); // servicesDown tells what failed
+    return servicesDown();
+}
+
+void Changes::tell(const ChangeRequest& request, const ChangeReport& report) {
+    revision_.advance();
+    for (const ChangeStep& step : report.steps) {
+        if (step.kind == StepKind::start || step.kind == StepKind::handOver) {
+            metrics_.countDaemonStart(step.subject);
+        }
+    }
+    if (!report.down.empty()) {
+        log_.write(request.call.id, sentenceOf(report.down));
+    }
+    Json::Value event = jsonObject(
+        {{"way", request.way}, {"actor", request.call.principal.actor}, {"request_id", request.call.id}});
+    if (report.id) {
+        event["id"] = Json::Int64{*report.id};
+    }
+    events_.publish("change", event);
+    if (request.options.confirmWithin && report.id) {
+        tellOfWaiting_();
+    }
+}
+
+} // namespace velt::host

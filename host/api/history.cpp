@@ -1,0 +1,251 @@
+#include "host/api/history.h"
+
+#include "base/json_value.h"
+#include "base/number_text.h"
+#include "base/utc_text.h"
+#include "host/api/problem.h"
+#include "host/api/settings_document.h"
+#include "host/base/json.h"
+#include "host/base/query_text.h"
+#include "host/base/random_text.h"
+
+#include <json/reader.h>
+
+#include <memory>
+#include <optional>
+#include <utility>
+
+namespace velt::host {
+
+namespace {
+
+constexpr int logCategory = 2;
+constexpr int logLevel = 1;
+constexpr unsigned takenBackEvent = 0x11BF0004;
+constexpr std::int64_t longestPage = 1000;
+
+/// What `changes` of a record says; a list.
+Json::Value changesOf(const ChangeRecord& change) {
+    Json::Value value;
+    const std::unique_ptr<Json::CharReader> reader(Json::CharReaderBuilder().newCharReader());
+    const char* const text = change.fields.data();
+    return reader->parse(text, text + change.fields.size(), &value, nullptr) && value.isArray()
+               ? value
+               : Json::Value(Json::arrayValue);
+}
+
+Json::Value toObject(const ChangeRecord& change) {
+    Json::Value object = jsonObject({{"id", Json::Int64{change.id}},
+                                     {"time", timestamp(change.time)},
+                                     {"actor", change.actor},
+                                     {"address", change.address},
+                                     {"way", change.way},
+                                     {"state", changeStateName(change.state)},
+                                     {"changes", changesOf(change)}});
+    if (change.confirmBy) {
+        object["confirm_by"] = timestamp(*change.confirmBy);
+    }
+    return object;
+}
+
+/// The place of a JSON Pointer with one or two names, all that records have.
+Json::Value& placeIn(Json::Value& document, const std::string& pointer) {
+    const std::size_t slash = pointer.find('/', 1);
+    Json::Value& section = document[pointer.substr(1, slash == std::string::npos ? slash : slash - 1)];
+    return slash == std::string::npos ? section : section[pointer.substr(slash + 1)];
+}
+
+/// The document without the change, and what stands in the way: fields that have another value since.
+struct Undoing {
+    Json::Value wanted;
+    std::vector<FieldError> conflicts;
+};
+
+Undoing undoing(const ChangeRecord& change, const Json::Value& current) {
+    Undoing result{current, {}};
+    for (const Json::Value& each : changesOf(change)) {
+        Json::Value& place = placeIn(result.wanted, each["field"].asString());
+        if (place == each["to"]) {
+            place = each["from"];
+        } else {
+            result.conflicts.push_back(
+                {each["field"].asString(), toJson(each["to"]) + ", as the change left it"});
+        }
+    }
+    return result;
+}
+
+HttpResponse noSuchChange(const Call& call) {
+    return problem(404, "There is no change " + call.path[2] + " in the history.", call.id);
+}
+
+/// The change that the path names. Or the problem.
+std::variant<ChangeRecord, HttpResponse> namedChange(const Call& call) {
+    const auto id = parseNumber(call.path[2]);
+    if (!id) {
+        return noSuchChange(call);
+    }
+    auto found = changeRecord(*id);
+    if (!found) {
+        return problem(500, found.error().message, call.id);
+    }
+    if (!*found) {
+        return noSuchChange(call);
+    }
+    return std::move(**found);
+}
+
+HttpResponse one(const Call& call) {
+    const auto change = namedChange(call);
+    const auto* const record = std::get_if<ChangeRecord>(&change);
+    return record != nullptr ? jsonResponse(200, toObject(*record)) : std::get<HttpResponse>(change);
+}
+
+std::variant<ChangeFilter, FieldError> filterIn(const std::string& query) {
+    ChangeFilter filter;
+    for (const auto& [key, value] : queryParameters(query)) {
+        const auto number = value ? parseNumber(*value) : std::nullopt;
+        if (key == "before" && number && *number > 0) {
+            filter.beforeId = *number;
+        } else if (key == "limit" && number && *number > 0 && *number <= longestPage) {
+            filter.limit = static_cast<int>(*number);
+        } else {
+            return FieldError{key, key == "before"  ? "the id of a change"
+                                   : key == "limit" ? "a number from 1 to 1000"
+                                                    : "before or limit"};
+        }
+    }
+    return filter;
+}
+
+HttpResponse list(const Call& call) {
+    const auto filter = filterIn(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&filter)) {
+        return fieldProblem(400, *bad, "", call.id);
+    }
+    const auto& wanted = std::get<ChangeFilter>(filter);
+    const auto changes = queryChanges(wanted);
+    if (!changes) {
+        return problem(500, changes.error().message, call.id);
+    }
+    const bool mayHaveMore = changes->size() == static_cast<std::size_t>(wanted.limit);
+    return jsonResponse(
+        200, jsonObject({{"next", mayHaveMore ? Json::Value(Json::Int64{changes->back().id}) : Json::Value()},
+                         {"changes",
+                          jsonArray(*changes, [](const ChangeRecord& each) { return toObject(each); })}}));
+}
+
+HttpResponse confirm(const Call& call) {
+    const auto change = namedChange(call);
+    const auto* const record = std::get_if<ChangeRecord>(&change);
+    if (record == nullptr) {
+        return std::get<HttpResponse>(change);
+    }
+    if (record->state != ChangeState::waiting) {
+        return problem(409,
+                       "The change " + call.path[2] + " does not wait for a confirmation: it is " +
+                           changeStateName(record->state) + ".",
+                       call.id);
+    }
+    const auto stored = setChangeState(record->id, ChangeState::confirmed);
+    return stored ? HttpResponse{204, "", "", {}} : problem(500, stored.error().message, call.id);
+}
+
+HttpResponse changedSince(const std::vector<FieldError>& conflicts, const Call& call) {
+    Json::Value members =
+        jsonObject({{"detail", conflicts.front().field + " was changed again since. Nothing was changed."},
+                    {"changed", false}});
+    for (const FieldError& each : conflicts) {
+        members["errors"].append(toObject(each));
+    }
+    return problemWith(409, std::move(members), call.id);
+}
+
+} // namespace
+
+History::History(const ModuleTable& table, AllSettings& settings, HostLog& log)
+    : table_(table), settings_(settings), log_(log) {}
+
+std::vector<Route> History::routes() {
+    using Kind = RequestOrder::Kind;
+    return {
+        {"GET", {"api", "history"}, false, Kind::search, list},
+        {"GET", {"api", "history", "*"}, false, Kind::unordered, one},
+        {"POST",
+         {"api", "history", "*", "undo"},
+         true,
+         Kind::write,
+         [this](const Call& call) { return undo(call); }},
+        // As a write: it must not come between the look for unconfirmed changes and their undoing.
+        {"POST", {"api", "history", "*", "confirm"}, true, Kind::write, confirm},
+    };
+}
+
+HttpResponse History::undo(const Call& call) {
+    const auto options = parseChangeOptions(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&options)) {
+        return fieldProblem(400, *bad, " Nothing was changed.", call.id);
+    }
+    const auto change = namedChange(call);
+    const auto* const record = std::get_if<ChangeRecord>(&change);
+    if (record == nullptr) {
+        return std::get<HttpResponse>(change);
+    }
+    if (record->state == ChangeState::undone) {
+        return problem(409, "The change " + call.path[2] + " is undone already.", call.id);
+    }
+    const auto current = readSettingsDocument(table_, call.principal);
+    if (!current) {
+        return problem(500, current.error().message, call.id);
+    }
+    const auto [wanted, conflicts] = undoing(*record, *current);
+    if (!conflicts.empty()) {
+        return changedSince(conflicts, call);
+    }
+    HttpResponse response =
+        settings_.store(wanted, "undo " + call.path[2], std::get<ChangeOptions>(options), call);
+    if (response.status == 200 && !std::get<ChangeOptions>(options).dryRun) {
+        if (const auto noted = setChangeState(record->id, ChangeState::undone); !noted) {
+            log_.write(call.id, noted.error().message);
+        }
+    }
+    return response;
+}
+
+bool History::takeBackUnconfirmed() {
+    ChangeFilter filter;
+    filter.state = ChangeState::waiting;
+    filter.limit = longestPage;
+    const auto waiting = queryChanges(filter);
+    if (!waiting) {
+        log_.write(waiting.error().message);
+        return false;
+    }
+    bool good = true;
+    for (const ChangeRecord& change : *waiting) { // the newest first, as they were laid on each other
+        if (change.confirmBy && *change.confirmBy <= std::chrono::system_clock::now()) {
+            good = takeBack(change) && good;
+        }
+    }
+    return good;
+}
+
+bool History::takeBack(const ChangeRecord& change) {
+    const std::string id = std::to_string(change.id);
+    const Call call{{}, {}, {Role::admin, "", "", ""}, nextRequestId()};
+    const auto current = readSettingsDocument(table_, call.principal);
+    if (!current) {
+        log_.write(call.id, current.error().message);
+        return false;
+    }
+    const auto logged =
+        logEvent(logCategory, logLevel, takenBackEvent, {id.c_str(), nullptr, nullptr, nullptr});
+    const HttpResponse response = settings_.store(undoing(change, *current).wanted, "undo " + id, {}, call);
+    if (response.status != 200) {
+        log_.write(call.id, "cannot take back the unconfirmed change " + id + ": " + response.body);
+        return false;
+    }
+    return logged && setChangeState(change.id, ChangeState::undone);
+}
+
+} // namespace velt::host

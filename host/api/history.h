@@ -1,0 +1,37 @@
+// /api/history: the changes of the settings; undoing and confirming them.
+#ifndef VELT_HOST_API_HISTORY_H
+#define VELT_HOST_API_HISTORY_H
+
+#include "host/api/all_settings.h"
+#include "host/api/route.h"
+#include "host/base/host_log.h"
+
+#include <vector>
+
+namespace velt::host {
+
+/// Thread-safe if reads and writes are ordered as its routes say.
+class History {
+public:
+    /// All of these outlive it.
+    History(const ModuleTable& table, AllSettings& settings, HostLog& log);
+
+    /// It outlives its routes.
+    std::vector<Route> routes();
+
+    /// Takes back each change whose time to confirm it is over, but for fields that were changed again since.
+    /// To be called as a write. False when one of them could not be taken back.
+    bool takeBackUnconfirmed();
+
+private:
+    HttpResponse undo(const Call& call);
+    bool takeBack(const ChangeRecord& change);
+
+    const ModuleTable& table_;
+    AllSettings& settings_;
+    HostLog& log_;
+};
+
+} // namespace velt::host
+
+#endif

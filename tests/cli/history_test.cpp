@@ -1,0 +1,79 @@
+#include "tests/cli/cli_test.h"
+
+namespace {
+
+const std::string newest = R"({"id": 12, "time": "2026-11-21T08:00:00Z", "actor": "anna", "address": "local",
+    "way": "settings", "state": "waiting", "confirm_by": "2026-11-21T08:01:00Z",
+    "changes": [{"field": "/ftp/timeout", "from": 300, "to": 600}]})";
+const std::string older = R"({"id": 11, "time": "2026-11-21T07:00:00Z", "actor": "", "address": "",
+    "way": "undo 9", "state": "undone", "changes": [{"field": "/a/1", "from": 1, "to": 2},
+    {"field": "/a/2", "from": 1, "to": 2}, {"field": "/a/3", "from": 1, "to": 2}, {"field": "/a/4", "from": 1, "to": 2}]})";
+
+class HistoryTest : public CliTest {
+protected:
+    void answer(const std::string& request, const std::string& body, int status = 200) {
+        host.answerWith(request, HttpReply{status, body, "application/json", false, false});
+    }
+    void SetUp() override {
+        answer("GET /api/history?limit=20", R"({"changes": [)" + newest + "," + older + R"(], "next": 11})");
+        answer("GET /api/history?limit=100",
+               R"({"changes": [)" + newest + "," + older + R"(], "next": null})");
+    }
+};
+
+TEST_F(HistoryTest, ChangesAreListed) {
+    EXPECT_EQ(run({"history"}).out,
+              "ID  TIME                  STATE    BY     WITH      CHANGED\n"
+              "12  2026-11-21T08:00:00Z  waiting  anna   settings  /ftp/timeout\n"
+              "11  2026-11-21T07:00:00Z  undone   veltd  undo 9    /a/1, /a/2, /a/3 and 1 more\n"
+              "Older ones: veltctl history --before 11\n");
+    EXPECT_EQ(jsonOf(run({"history", "--json"}).out)["changes"].size(), 2U);
+    answer("GET /api/history?limit=3&before=11", R"({"changes": [], "next": null})");
+    EXPECT_EQ(run({"history", "--before", "11", "--limit", "3"}).code, 0);
+    EXPECT_EQ(run({"history", "--limit", "0"}).code, 2);
+}
+
+TEST_F(HistoryTest, OneChangeIsShownFieldByField) {
+    answer("GET /api/history/12", newest);
+    EXPECT_EQ(run({"history", "12"}).out, "FIELD         FROM  TO\n/ftp/timeout  300   600\n");
+    EXPECT_EQ(run({"history", "x"}).code, 2);
+    answer("GET /api/history/7", R"({"title": "There is no change 7 in the history."})", 404);
+    EXPECT_NE(run({"history", "7"}).err.find("'veltctl history' lists"), std::string::npos);
+}
+
+TEST_F(HistoryTest, TheNewestIsUndoneUnlessAnotherIsNamed) {
+    const std::string report =
+        R"({"dry_run": false, "changes": [{"field": "/ftp/timeout", "from": 600, "to": 300}], "effects": []})";
+    answer("POST /api/history/12/undo", report);
+    EXPECT_EQ(run({"undo"}).out, "ftp/timeout: 600 -> 300\n");
+    answer("POST /api/history/11/undo?dry_run=true", R"({"dry_run": true, "changes": [], "effects": []})");
+    EXPECT_EQ(run({"undo", "11", "--dry-run"}).out, "Nothing to change.\n");
+    answer("GET /api/history?limit=100", R"({"changes": [)" + older + R"(], "next": null})");
+    const RunResult none = run({"undo"});
+    EXPECT_EQ(none.code, 3);
+    EXPECT_NE(none.err.find("There is no change to undo."), std::string::npos) << none.err;
+}
+
+TEST_F(HistoryTest, TheOneThatWaitsIsConfirmed) {
+    host.answerWith("POST /api/history/12/confirm", HttpReply{204, "", "", false, false});
+    EXPECT_EQ(run({"confirm"}).out, "Change 12 stays.\n");
+    EXPECT_EQ(jsonOf(run({"confirm", "12", "--json"}).out)["confirmed"], 12);
+    answer("GET /api/history?limit=100", R"({"changes": [], "next": null})");
+    EXPECT_NE(run({"confirm"}).err.find("There is no change to confirm."), std::string::npos);
+}
+
+} // namespace
+
+using RestartTest = CliTest;
+
+TEST_F(RestartTest, SaysWhatBecameOfTheSessions) {
+    host.answerWith("POST /api/restart?sessions=keep&service=ftp",
+                    HttpReply{200, R"({"services": [{"service": "ftp", "ended": 0, "kept": 3}]})",
+                              "application/json", false, false});
+    EXPECT_EQ(run({"restart", "ftp"}).out, "ftp: restarted, 3 sessions go on, 0 ended\n"
+                                           "The services that are on run with what is stored now.\n");
+    host.answerWith("POST /api/restart?sessions=end",
+                    HttpReply{200, R"({"services": []})", "application/json", false, false});
+    EXPECT_EQ(run({"restart", "--end-sessions"}).code, 0);
+    EXPECT_EQ(run({"restart", "ftps"}).code, 2);
+}

@@ -1,0 +1,110 @@
+// The history of the settings.
+#include "tests/host/fake_standalone.h"
+#include "tests/host/host_test.h"
+#include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/waiting.h"
+
+namespace {
+
+using velt::ChangeState;
+
+class HostHistory : public HostTest {
+protected:
+    void SetUp() override {
+        platform.reset();
+        access = {};
+        settings.workers = 1; // the fake platform knows one thread
+        start();
+    }
+
+    Answer setTimeOut(int seconds, const std::string& query = "") const {
+        return ask("PATCH", "/api/settings" + query, admin,
+                   R"({"ftp":{"timeout":)" + std::to_string(seconds) + "}}");
+    }
+    int timeOut() const { return get("/api/settings").json()["ftp"]["timeout"].asInt(); }
+
+    fake::Platform& platform = fake::Platform::instance();
+    FakeStandalone& access = FakeStandalone::instance();
+};
+
+TEST_F(HostHistory, IsPagedFromTheNewest) {
+    for (const int seconds : {400, 500, 600}) {
+        ASSERT_EQ(setTimeOut(seconds).status, 200);
+    }
+    const Json::Value page = get("/api/history?limit=2").json();
+    ASSERT_EQ(page["changes"].size(), 2U);
+    EXPECT_EQ(page["changes"][0]["id"], 3);
+    EXPECT_EQ(page["changes"][0]["changes"][0]["to"], 600);
+    EXPECT_EQ(page["changes"][0]["state"], "done");
+    const Json::Value rest = get("/api/history?before=" + page["next"].asString()).json();
+    EXPECT_EQ(rest["changes"].size(), 1U);
+    EXPECT_TRUE(rest["next"].isNull());
+    EXPECT_EQ(get("/api/history/2").json()["changes"][0]["from"], 400);
+    EXPECT_EQ(get("/api/history/7").status, 404);
+    EXPECT_EQ(get("/api/history/x").status, 404);
+    EXPECT_EQ(get("/api/history?limit=0").json()["errors"][0]["field"], "limit");
+    EXPECT_EQ(get("/api/history?since=1").status, 400);
+}
+
+TEST_F(HostHistory, AChangeIsUndoneOnce) {
+    ASSERT_EQ(setTimeOut(600).status, 200);
+    const Answer dry = post("/api/history/1/undo?dry_run=true");
+    EXPECT_EQ(dry.json()["changes"][0]["to"], 300) << dry.body;
+    EXPECT_EQ(timeOut(), 600);
+    EXPECT_EQ(post("/api/history/1/undo").status, 200);
+    EXPECT_EQ(timeOut(), 300);
+    EXPECT_EQ(access.history[0].state, ChangeState::undone);
+    EXPECT_EQ(access.history[1].way, "undo 1");
+    EXPECT_EQ(post("/api/history/1/undo").status, 409);
+    EXPECT_EQ(post("/api/history/2/undo").status, 200) << "an undo can be undone";
+    EXPECT_EQ(timeOut(), 600);
+    EXPECT_EQ(post("/api/history/9/undo").status, 404);
+    EXPECT_EQ(ask("POST", "/api/history/1/undo", viewer).status, 403);
+}
+
+TEST_F(HostHistory, WhatWasChangedAgainIsNotUndone) {
+    ASSERT_EQ(setTimeOut(600).status, 200);
+    ASSERT_EQ(setTimeOut(700).status, 200);
+    const Answer answer = post("/api/history/1/undo");
+    EXPECT_EQ(answer.status, 409);
+    EXPECT_EQ(answer.json()["errors"][0]["field"], "/ftp/timeout");
+    EXPECT_EQ(answer.json()["detail"], "/ftp/timeout was changed again since. Nothing was changed.");
+    EXPECT_EQ(timeOut(), 700);
+}
+
+TEST_F(HostHistory, AnUnconfirmedChangeIsTakenBack) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    EXPECT_EQ(access.history[0].state, ChangeState::waiting);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return timeOut() == 300; }, velt::test::patience));
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "undone"; },
+                                      velt::test::patience));
+    EXPECT_EQ(get("/api/history/2").json()["way"], "undo 1");
+    EXPECT_EQ(get("/api/history/2").json()["actor"], "");
+}
+
+TEST_F(HostHistory, AConfirmedChangeStays) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=2").status, 200);
+    EXPECT_EQ(post("/api/history/1/confirm").status, 204);
+    EXPECT_EQ(access.history[0].state, ChangeState::confirmed);
+    EXPECT_EQ(post("/api/history/1/confirm").status, 409);
+    EXPECT_EQ(setTimeOut(601, "?confirm_within=1").status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return timeOut() == 600; }, velt::test::patience))
+        << "the other is taken back to it";
+    EXPECT_EQ(post("/api/history/5/confirm").status, 404);
+}
+
+TEST_F(HostHistory, WhatWaitedAtTheEndOfVeltdIsTakenBackByTheNext) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    stop();
+    start();
+    EXPECT_TRUE(velt::test::waitUntil([&] { return timeOut() == 300; }, velt::test::patience));
+}
+
+TEST_F(HostHistory, AFailedChangeDoesNotWait) {
+    access.commitFails = true;
+    access.sentence = "No luck.";
+    EXPECT_EQ(setTimeOut(600, "?confirm_within=60").status, 500);
+    EXPECT_EQ(access.history[0].state, ChangeState::undone);
+}
+
+} // namespace
