@@ -130,7 +130,10 @@ HttpResponse AllSettings::store(const Json::Value& wanted, const std::string& wa
         return *refusal;
     }
     HttpResponse response = jsonResponse(200, toObject(std::get<ChangeReport>(made)));
-    response.headers.emplace_back("ETag", tagOf(options.dryRun ? *before : wanted));
+    // Some of what was wanted may be stored in another form, such as a range that is not in use.
+    if (const auto now = readSettingsDocument(table_, call.principal)) {
+        response.headers.emplace_back("ETag", tagOf(*now));
+    }
     return response;
 }
 

@@ -191,6 +191,10 @@ void Changes::tell(const ChangeRequest& request, const ChangeReport& report) {
             metrics_.countDaemonStart(step.subject);
         }
     }
+    log_.write(request.call.id,
+               request.way + " for " + request.call.principal.actor + " at " +
+                   request.call.principal.address + ": " +
+                   (report.changes.empty() ? "no other settings" : summaryOf(report.changes)));
     if (!report.down.empty()) {
         log_.write(request.call.id, sentenceOf(report.down));
     }

@@ -27,12 +27,20 @@ constexpr const char* tableSql = R"(
         address TEXT NOT NULL,
         way TEXT NOT NULL,
         fields TEXT NOT NULL,
+        size INTEGER NOT NULL,
         state INTEGER NOT NULL,
         confirm_by INTEGER);
 )";
 
-constexpr const char* insertSql = "INSERT INTO change (time, actor, address, way, fields, state, confirm_by) "
-                                  "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7)";
+constexpr const char* insertSql =
+    "INSERT INTO change (time, actor, address, way, fields, size, state, confirm_by) "
+    "VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8)";
+// The newest change at which those from it on take more than so many bytes, and all older ones.
+constexpr const char* removeBySizeSql = R"(
+    DELETE FROM change WHERE id <= (
+        SELECT MAX(id) FROM (SELECT id, SUM(size) OVER (ORDER BY id DESC) AS total FROM change)
+        WHERE total > ?1 AND id < ?2)
+)";
 constexpr const char* columns =
     "SELECT id, time, actor, address, way, fields, state, confirm_by FROM change ";
 
@@ -80,8 +88,9 @@ public:
         statement.bind(3, change.address);
         statement.bind(4, change.way);
         statement.bind(5, change.fields);
-        statement.bind(6, static_cast<std::int64_t>(change.state));
-        statement.bind(7, change.confirmBy ? std::optional(numberOf(*change.confirmBy)) : std::nullopt);
+        statement.bind(6, static_cast<std::int64_t>(change.fields.size()));
+        statement.bind(7, static_cast<std::int64_t>(change.state));
+        statement.bind(8, change.confirmBy ? std::optional(numberOf(*change.confirmBy)) : std::nullopt);
         if (statement.run() != SQLITE_DONE) {
             return cannotBe("written");
         }
@@ -134,6 +143,7 @@ private:
 
 Result<> removeOld(History& history, std::int64_t newest, system_clock::time_point now) {
     VELT_RETURN_IF_ERROR(history.run("DELETE FROM change WHERE id <= ?1", {newest - keptChanges}));
+    VELT_RETURN_IF_ERROR(history.run(removeBySizeSql, {keptBytes, newest}));
     const auto retention = loadRetention();
     // Keeping too much harms less than deleting by a rule that nobody wrote.
     if (!retention || retention->maxAgeDays == 0) {

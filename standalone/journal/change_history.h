@@ -44,6 +44,9 @@ struct ChangeFilter {
 /// log (log_retention.h).
 inline constexpr int keptChanges = 10'000;
 
+/// What the fields of the kept changes take together, in bytes; the newest change is kept whatever it takes.
+inline constexpr std::int64_t keptBytes = std::int64_t{64} * 1024 * 1024;
+
 /// Writes the change down, and returns its id. Thread-safe, as the others.
 Result<std::int64_t> recordChange(const ChangeRecord& change);
 
