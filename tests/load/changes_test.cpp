@@ -89,6 +89,15 @@ const std::vector<Administrator> administrators{
      }},
 };
 
+/// Waits for the end of a former daemon that shares its port with the new one.
+void waitForOneDaemonAPort() {
+    EXPECT_TRUE(waitUntil(
+        [] {
+            return runProcess({"bash", "-c", "ss -Hltn | awk '{print $4}' | sort | uniq -d"}).output.empty();
+        },
+        patience));
+}
+
 /// Whether what one of them changes at once is seen at once.
 bool isWhole(const std::string& path, const Json::Value& read) {
     if (path == rulesPath + "load") {
@@ -180,11 +189,13 @@ TEST_F(Changes, InGreatNumberLeaveNothingBehind) {
         const Answer changed = setFtp(root, "\"timeout\":" + std::to_string(100 + i % 2));
         ASSERT_EQ(changed.status, 204) << i << " " << changed.body;
         if (i == settled) {
+            waitForOneDaemonAPort();
             before = holdings();
         } else if (i % 100 == 0) {
             reap();
         }
     }
+    waitForOneDaemonAPort();
     const Holdings after = holdings();
     std::cout << "after " << settled << " changes: " << before << "\nafter " << count << ": " << after
               << '\n';

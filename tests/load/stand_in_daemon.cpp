@@ -30,6 +30,7 @@ int listenOn(int port) {
     const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
     const int on = 1;
     ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
+    ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEPORT, &on, sizeof on); // as a successor of its like needs it
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_port = htons(static_cast<in_port_t>(port));
