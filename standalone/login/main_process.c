@@ -3,6 +3,7 @@
 #include "conf.h"
 #include "privs.h"
 
+#include <errno.h>
 #include <fcntl.h>
 #include <signal.h>
 #include <stdio.h>
@@ -39,7 +40,9 @@ void velt_keep_scoreboard(void) {
 
     if (name_of_kept(kept, sizeof(kept))) {
         PRIVS_ROOT(void) unlink(kept);
-        (void)link(pr_get_scoreboard(), kept);
+        if (link(pr_get_scoreboard(), kept) < 0 && errno != ENOENT) {
+            pr_log_pri(PR_LOG_NOTICE, "velt: cannot keep %s: %s", pr_get_scoreboard(), strerror(errno));
+        }
         PRIVS_RELINQUISH
     }
 }

@@ -15,8 +15,8 @@ namespace velt {
 /// Starts the program arguments[0], a path, with /dev/null as its standard input and `output` as its output
 /// and error, no signal blocked or ignored, and an environment of PATH and LANG=C.UTF-8 alone; of the other
 /// descriptors it gets those that are not closed on exec. It is a process already when `announce` is called,
-/// and does nothing before that has succeeded; where it fails, or this process ends first, so does that one. For a process
-/// with one thread.
+/// and does nothing before that has succeeded; where it fails, or this process ends first, so does that one.
+/// For a process with one thread.
 Result<pid_t> startAnnounced(const std::vector<std::string>& arguments, int output,
                              const std::function<Result<>()>& announce);
 

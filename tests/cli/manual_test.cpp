@@ -44,8 +44,9 @@ TEST(ManualTest, ThePageNamesEveryCommandAndOption) {
 
 TEST(ManualTest, ThePageNamesEveryExitCode) {
     const std::string page = rendered();
-    for (const char* code : {" 0 Done", " 1 A file", " 2 The command line", " 3 The input was refused",
-                             " 4 The input conflicts", " 5 The server failed", " 6 The server cannot", " 8 Done"}) {
+    for (const char* code :
+         {" 0 Done", " 1 A file", " 2 The command line", " 3 The input was refused", " 4 The input conflicts",
+          " 5 The server failed", " 6 The server cannot", " 8 Done"}) {
         EXPECT_NE(page.find(code), std::string::npos) << code;
     }
 }
