@@ -130,7 +130,7 @@ void checkFtp(const Json::Value& wanted, const Json::Value& current, Errors& err
 }
 
 void checkSecurity(const Json::Value& wanted, Errors& errors) {
-    if (wanted["anonymous_chroot"] == true && wanted["anonymous_chroot_share"] == "") {
+    if (wanted["anonymous_chroot"] == true && wanted["anonymous_chroot_share"].asString().empty()) {
         errors.push_back({"/security/anonymous_chroot_share", "the name of a share, for anonymous_chroot"});
     }
 }
@@ -186,7 +186,7 @@ std::optional<FieldError> faultOfRule(const Json::Value& rule, const std::string
     }
     for (const std::string& key : rule.getMemberNames()) {
         if (key != "type" && key != "name" && key != "path") {
-            return FieldError{place + "/" + key, "only type, name and path"};
+            return FieldError{std::string(place).append("/").append(key), "only type, name and path"};
         }
     }
     const auto text = [&](const char* key) { return rule[key].isString() ? rule[key].asString() : ""; };

@@ -72,7 +72,8 @@ void compareSections(const std::string& name, const Json::Value& before, const J
                      std::vector<FieldChange>& changes) {
     for (const std::string& key : after.getMemberNames()) {
         if (before[key] != after[key] && !isIdleRange(key, before, after)) {
-            changes.push_back({"/" + name + "/" + key, before[key], after[key]});
+            changes.push_back(
+                {std::string("/").append(name).append("/").append(key), before[key], after[key]});
         }
     }
 }

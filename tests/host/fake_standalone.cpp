@@ -108,7 +108,7 @@ private:
     velt::ChangeSteps steps() const { return stepsSince(start_); }
     static int ended(velt::SessionPolicy policy) { return policy == velt::SessionPolicy::keep ? 0 : 3; }
 
-    const fake::State before_ = fake::Platform::instance();
+    const fake::State before_ = static_cast<const fake::State&>(fake::Platform::instance());
     const std::size_t start_ = fake::Platform::instance().journal.size();
     bool committed_ = false;
 };

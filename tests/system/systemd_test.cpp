@@ -80,7 +80,7 @@ TEST_F(UnderSystemd, aChangeHandsThePortOverAndKeepsTheSessions) {
         openMachine();
         storeFtp(plain, 2121);
         ASSERT_EQ(VLIBServiceStart("ftpd", 0), 0) << lastErrorSentence();
-        std::ofstream("/home/alice/large") << std::string(20000000, 'x');
+        std::ofstream("/home/alice/large") << std::string(std::size_t{20} * 1000 * 1000, 'x');
         std::string size;
         std::thread client([&size] {
             size = runProcess({"curl", "-sS", "--limit-rate", "5M", "-o", "/dev/null", "-w",

@@ -243,7 +243,7 @@ TEST_F(ServiceWatchTest, WhatThisProgramDoesIsNotLogged) {
 class FailedBootStart : public ServiceWatchTest {
 protected:
     void SetUp() override {
-        ServicesTest::SetUp();
+        ServicesTest::SetUp(); // NOLINT(bugprone-parent-virtual-call): without the start of the class between
         other_.emplace(ftpPort_);
         ASSERT_NE(messageOf(startEnabledServices()), "");
         ASSERT_EQ(messageOf(watchServices()), "");
