@@ -104,11 +104,11 @@ HttpResponse one(const Call& call) {
 std::variant<ChangeFilter, FieldError> filterIn(const std::string& query) {
     ChangeFilter filter;
     for (const auto& [key, value] : queryParameters(query)) {
-        const auto number = value ? parseNumber(*value) : std::nullopt;
-        if (key == "before" && number && *number > 0) {
-            filter.beforeId = *number;
-        } else if (key == "limit" && number && *number > 0 && *number <= longestPage) {
-            filter.limit = static_cast<int>(*number);
+        const std::int64_t number = parseNumber(value.value_or("")).value_or(0);
+        if (key == "before" && number > 0) {
+            filter.beforeId = number;
+        } else if (key == "limit" && number > 0 && number <= longestPage) {
+            filter.limit = static_cast<int>(number);
         } else {
             return FieldError{key, key == "before"  ? "the id of a change"
                                    : key == "limit" ? "a number from 1 to 1000"

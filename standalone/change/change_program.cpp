@@ -159,8 +159,8 @@ ProgramStep journalStep(const LogEntry& entry) {
 ProgramStep journalStep(const SystemEvent& event) {
     std::string subject;
     for (const auto& [name, value] : event.parameters) {
-        subject =
-            value + (subject.empty() ? "" : " ") + subject; // "ftpd stop": by name, the action comes first
+        // "ftpd stop": by name, the action comes first.
+        subject.insert(0, subject.empty() ? "" : " ").insert(0, value);
     }
     return {{StepKind::event, subject}, {}};
 }
