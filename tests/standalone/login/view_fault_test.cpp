@@ -55,9 +55,9 @@ protected:
         chmod(root_.path().c_str(), 0755);
         setStateRoot(root_.path());
         fs::create_directory(root_.path() / "view");
-        fs::create_directory_symlink("work", root_.path() / "link");
-        for (const char* file : {"home/letter", "home/private/diary", "work/plan", "work/drafts/draft",
-                                 "work/secret/file", "work/secret/deep/file", "music/song"}) {
+        fs::create_directory_symlink("team", root_.path() / "link");
+        for (const char* file : {"home/letter", "home/private/diary", "team/plan", "team/drafts/draft",
+                                 "team/secret/file", "team/secret/deep/file", "music/song"}) {
             root_.write(file, "x");
         }
         for (const auto& entry : fs::recursive_directory_iterator(root_.path())) {
@@ -75,14 +75,14 @@ protected:
         };
         ASSERT_EQ(
             messageOf(storeShares(
-                {share("work", "work", Access::write), share("drafts", "work/drafts", Access::read),
+                {share("team", "team", Access::write), share("drafts", "team/drafts", Access::read),
                  share("secret", "link/secret", Access::none), share("private", "home/private", Access::none),
                  share("music", "music", Access::read)})),
             "");
     }
     void TearDown() override { setStateRoot("/"); }
 
-    /// What the login can do in the view, a line for each: "see work/plan", "write work".
+    /// What the login can do in the view, a line for each: "see team/plan", "write team".
     std::string rightsIn(const fs::path& view) const {
         std::string rights;
         for (const auto& entry : fs::recursive_directory_iterator(view)) {
@@ -140,7 +140,7 @@ TEST_P(ViewFaults, ShowNoMoreThanTheLoginMaySee) {
         if (!whole) {
             whole = rights;
             EXPECT_GE(whole->size(), 1U);
-            EXPECT_FALSE(whole->contains("see work/secret/file"));
+            EXPECT_FALSE(whole->contains("see team/secret/file"));
         }
         EXPECT_TRUE(std::ranges::includes(*whole, rights)) << run.end.told;
         EXPECT_TRUE(remarked || rights == *whole) << "less, and nothing is said: " << run.end.told;
@@ -151,8 +151,8 @@ TEST_P(ViewFaults, ShowNoMoreThanTheLoginMaySee) {
 constexpr ViewCase views[] = {
     {"AHome", DefaultView::home, ""},
     {"TheShares", DefaultView::shares, ""},
-    {"AShareOfARule", DefaultView::home, "/work"},
-    {"AFolderOfARule", DefaultView::shares, "/work/drafts"},
+    {"AShareOfARule", DefaultView::home, "/team"},
+    {"AFolderOfARule", DefaultView::shares, "/team/drafts"},
     {"AGuest", DefaultView::anonymous, ""},
 };
 
