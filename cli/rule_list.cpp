@@ -24,7 +24,7 @@ std::optional<std::string> faultIn(const Json::Value& object) {
 
 } // namespace
 
-// The server takes any type but "user" for a group, and fails to load a rule with an empty path.
+// What the server would refuse as well, said before it is asked.
 std::optional<std::string> faultOf(const ChrootRule& rule) {
     if (rule.type != "user" && rule.type != "group") {
         return "type: expected user or group";

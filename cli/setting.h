@@ -1,4 +1,4 @@
-// The settings that can be changed one by one, and their changes.
+// The settings that can be changed one by one.
 #ifndef VELT_CLI_SETTING_H
 #define VELT_CLI_SETTING_H
 

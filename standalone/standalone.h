@@ -1,9 +1,9 @@
 // What the platform library offers the program that loads the module over it, beside the contract.
 //
-// A host, at its start: openState, the subscriptions, startEnabledServices, watchServices. Then, for each
-// request, on the thread that serves it: setRequestActor, clearLastError, a ServiceRequest around the
-// module's entry function, and after a failure lastErrorSentence or lastPortConflict for the answer. A change
-// that was accepted is in force when servicesDown is empty after it.
+// A host, at its start: openState, the subscriptions, undoUnfinishedChange, startEnabledServices,
+// watchServices. Then, for each request, on the thread that serves it: setRequestActor, clearLastError,
+// around one that changes something a SettingsChange, the module's entry function, and after a failure
+// lastErrorSentence or lastPortConflict for the answer.
 //
 // Unless it says otherwise a function may be called from any thread.
 #ifndef VELT_STANDALONE_STANDALONE_H
@@ -39,7 +39,7 @@
 #include "standalone/contract/last_error.h"
 
 // Listing effects instead of doing them, or failing them; hearing which were done, with what result and in
-// what time. Undoing is not in here: a host that wants it keeps what was before, and sets that again.
+// what time.
 #include "standalone/core/effects.h"
 
 #endif

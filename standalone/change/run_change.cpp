@@ -38,7 +38,8 @@ Result<> bringBack(const Daemon& daemon, RunState former) {
 /// Everything as it was. Goes on after a failure, and returns the first.
 Result<> undo(const StagedRequest& request, const FormerStates& former) {
     Result<> outcome;
-    const auto lock = StateLock::take(); // without it, too: better so than not at all
+    // Without the lock, too: better so than not at all. Not held while daemons start.
+    auto lock = std::optional(StateLock::take());
     const auto note = [&outcome](Result<> done) {
         if (!done && outcome) {
             outcome = std::move(done);
@@ -50,6 +51,7 @@ Result<> undo(const StagedRequest& request, const FormerStates& former) {
     if (outcome) {
         note(forgetChange()); // else the next start of this system tries once more
     }
+    lock.reset();
     for (const auto& [daemon, state] : former) {
         note(bringBack(*daemon, state));
     }

@@ -34,8 +34,8 @@ Result<> perform(Effect effect, std::string_view subject, const std::function<Re
 using EffectDecision = std::optional<Result<>>;
 using EffectHook = std::function<EffectDecision(Effect effect, std::string_view subject)>;
 
-/// Sets the calling thread's hook in place of its former one; an empty function removes it. For tests, which
-/// list effects, leave them undone or fail them; the product sets none.
+/// Sets the calling thread's hook in place of its former one; an empty function removes it. A change
+/// that is staged sets one, and so do tests, which list effects, leave them undone or fail them.
 void setEffectHook(EffectHook hook);
 
 /// Told of each effect that was done, or tried, with its outcome (an error, too, when it threw) and what it
