@@ -53,28 +53,22 @@ public:
     WatchedDaemon(const Daemon& daemon, bool restoresSupervisors)
         : daemon_(daemon), retry_(daemon), restoresSupervisors_(restoresSupervisors) {}
 
-    /// Tells what has happened. To be called whenever something may have.
-    void look() {
+    /// Tells what has happened. To be called whenever something may have. With `mends`, also starts the
+    /// daemon again where that is for us to do: from the same reading, so that no end is mended untold.
+    void look(bool mends) {
         // Counted before the state is read: what begins in between counts as ours at the next look, too.
         const std::uint64_t operations = operationCount(daemon_);
         const bool byUs = operations != operations_ || operations % 2 != 0;
         const DaemonState state = currentState();
-        if (operationCount(daemon_) == operations) {
-            for (const Incident& each : teller_.look(state, byUs, lostItsSupervisor(state))) {
-                recordIncident(daemon_, each);
-            }
-            operations_ = operations;
+        if (operationCount(daemon_) != operations) {
+            return;
         }
-    }
-
-    /// Starts it again where that is for us to do.
-    void mend() {
-        const DaemonState state = currentState();
-        if (restoresSupervisors_) {
-            mendLost(state);
+        for (const Incident& each : teller_.look(state, byUs, lostItsSupervisor(state))) {
+            recordIncident(daemon_, each);
         }
-        if (!retryAt_ && holds() == 0 && retry_.isDue(state)) {
-            start([this] { return startDaemon(daemon_); });
+        operations_ = operations;
+        if (mends) {
+            mend(state);
         }
     }
 
@@ -84,6 +78,15 @@ private:
     DaemonState currentState() const {
         DaemonState state = daemonState(daemon_);
         return lostItsSupervisor(state) ? daemonState(daemon_) : state;
+    }
+
+    void mend(const DaemonState& state) {
+        if (restoresSupervisors_) {
+            mendLost(state);
+        }
+        if (!retryAt_ && holds() == 0 && retry_.isDue(state)) {
+            start([this] { return startDaemon(daemon_); });
+        }
     }
 
     void mendLost(const DaemonState& state) {
@@ -167,7 +170,7 @@ public:
             daemons_.emplace_back(*daemon, !systemdKeepsSupervisors());
         }
         // Before this returns, so that whatever happens from then on is told.
-        attempt([this] { std::ranges::for_each(daemons_, &WatchedDaemon::look); });
+        look(false);
         thread_ = std::thread([this] { run(); });
     }
     ~ServiceWatch() {
@@ -178,22 +181,24 @@ public:
     ServiceWatch& operator=(const ServiceWatch&) = delete;
 
 private:
-    static void attempt(const std::function<void()>& act) {
-        try {
-            act();
-        } catch (const std::exception& error) {
-            ::syslog(LOG_ERR, "cannot watch the daemons: %s", error.what());
+    void look(bool mends) {
+        for (WatchedDaemon& daemon : daemons_) {
+            try {
+                daemon.look(mends);
+            } catch (const std::exception& error) {
+                ::syslog(LOG_ERR, "cannot watch the daemons: %s", error.what());
+            }
         }
     }
 
     void run() {
         auto next = Clock::now();
         do {
-            attempt([this] { std::ranges::for_each(daemons_, &WatchedDaemon::look); });
-            if (Clock::now() >= next) {
+            const bool mends = Clock::now() >= next;
+            if (mends) {
                 next = Clock::now() + interval;
-                attempt([this] { std::ranges::for_each(daemons_, &WatchedDaemon::mend); });
             }
+            look(mends);
         } while (
             folder_.wait(std::max(milliseconds(1), std::chrono::ceil<milliseconds>(next - Clock::now()))));
     }
