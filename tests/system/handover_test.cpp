@@ -163,7 +163,7 @@ TEST_F(HandOver, downloadsGoOnThroughManyChangesAndNobodyIsRefused) {
         change();
         ProcessResult download;
         std::thread client([&] { download = fetchSlowly(encrypted); });
-        EXPECT_TRUE(waitUntil([] { return sessionsOfFtp() > 0; }, seconds(5)));
+        EXPECT_TRUE(waitUntil([] { return sessionsOfFtp() > 0; }, patience));
         std::this_thread::sleep_for(milliseconds(300));
         ConnectLoop loop(port);
         for (int i = 0; i < 20; ++i) {
@@ -227,7 +227,7 @@ TEST_F(HandOver, allSessionsCountForTheLimitOfConnections) {
     change();
     const FtpSession third = aliceAt(port);
     EXPECT_EQ(FtpSession(port).greeting().code, 530);
-    EXPECT_TRUE(waitUntil([] { return sessionsOfFtp() == 3; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([] { return sessionsOfFtp() == 3; }, patience));
 }
 
 TEST_F(HandOver, twoSessionsNeverHaveOneDataPort) {
@@ -280,7 +280,7 @@ TEST_F(HandOver, aDaemonThatDoesNotComeUpLeavesTheFormerOneServing) {
     ASSERT_EQ(down.size(), 1U);
     EXPECT_TRUE(down.front().servesFormerSettings);
     fs::remove(delays);
-    EXPECT_TRUE(waitUntil([] { return sessionsOfFtp() == 1; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([] { return sessionsOfFtp() == 1; }, patience));
 }
 
 TEST_F(HandOver, leavesNothingBehind) {
@@ -290,7 +290,7 @@ TEST_F(HandOver, leavesNothingBehind) {
         changeAnything();
     }
     EXPECT_EQ(filesBelow(statePath("/run/velt/ftp/daemon")), former);
-    EXPECT_TRUE(waitUntil([] { return processesNamed("proftpd").size() == 1; }, seconds(4)));
+    EXPECT_TRUE(waitUntil([] { return processesNamed("proftpd").size() == 1; }, patience));
 }
 
 } // namespace

@@ -149,8 +149,7 @@ TEST_F(HostDoor, strangersLearnTwoWords) {
     }
     done({"ftp", "set", "enable_ftp=on"});
     writeFile(worldRoot / "etc/velt/shares.json", "{");
-    EXPECT_TRUE(waitUntil([] { return contains(veltctl({"doctor"}).output, "shares.json"); },
-                          std::chrono::seconds(5)));
+    EXPECT_TRUE(waitUntil([] { return contains(veltctl({"doctor"}).output, "shares.json"); }, patience));
     EXPECT_EQ(ask(requestText("GET", "/readyz")).body, R"({"status":"failed"})");
     EXPECT_EQ(ask(requestText("GET", "/healthz")).body, R"({"status":"ok"})");
     makeShares();

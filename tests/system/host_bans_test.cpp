@@ -71,7 +71,7 @@ protected:
     }
 
     static bool becomesBanned(const std::string& who) {
-        return waitUntil([&who] { return banned() == who; }, seconds(5));
+        return waitUntil([&who] { return banned() == who; }, patience);
     }
 };
 

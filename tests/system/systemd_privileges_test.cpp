@@ -112,7 +112,7 @@ public:
         const auto isAlices = [this] {
             return statusOf(std::to_string(process_), "Uid").starts_with("1001");
         };
-        EXPECT_TRUE(waitUntil(isAlices, seconds(5)));
+        EXPECT_TRUE(waitUntil(isAlices, patience));
     }
     ~AlicesListener() {
         ::kill(process_, SIGKILL);
@@ -320,7 +320,7 @@ void endSupervisor(const std::string& service) {
     ASSERT_EQ(runProcess({"systemctl", "daemon-reload"}).exitCode, 0);
     const ProcessId supervisor = serviceState(service).supervisor;
     signalProcess(supervisor, SIGKILL);
-    ASSERT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, seconds(5)));
+    ASSERT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, patience));
 }
 
 TEST_F(UnderSystemd, theHostEndsTheSftpSessionsOfASupervisorThatIsGone) {
@@ -347,7 +347,7 @@ TEST_F(UnderSystemd, theHostEndsTheFtpSessionsOfASupervisorThatIsGone) {
                       0);
         });
         EXPECT_TRUE(
-            waitUntil([] { return fs::exists("/root/got") && fs::file_size("/root/got") > 0; }, seconds(10)));
+            waitUntil([] { return fs::exists("/root/got") && fs::file_size("/root/got") > 0; }, patience));
         endSupervisor("ftpd");
         done({"ftp", "set", "enable_ftp=off"});
         EXPECT_NE(runProcess({"pidof", "proftpd"}).exitCode, 0) << "a session goes on";
@@ -361,7 +361,7 @@ TEST_F(UnderSystemd, aWrongOptionIsNotTriedAgain) {
         fs::create_directories("/etc/default");
         std::ofstream("/etc/default/veltd") << "VELTD_OPTIONS=--no-such-option\n";
         runProcess({"systemctl", "restart", "veltd"}, {}, seconds(20));
-        EXPECT_TRUE(waitUntil([] { return unitState("veltd.service") == "failed"; }, seconds(5)));
+        EXPECT_TRUE(waitUntil([] { return unitState("veltd.service") == "failed"; }, patience));
         EXPECT_EQ(unitProperty("veltd.service", "ExecMainStatus"), "2");
         EXPECT_EQ(unitProperty("veltd.service", "NRestarts"), "0");
     });

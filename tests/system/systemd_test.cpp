@@ -89,7 +89,7 @@ TEST_F(UnderSystemd, aChangeHandsThePortOverAndKeepsTheSessions) {
                        .output;
         });
         const ProcessId former = serviceState("ftpd").daemon;
-        EXPECT_TRUE(waitUntil([&] { return !childrenOf(former.pid).empty(); }, std::chrono::seconds(5)));
+        EXPECT_TRUE(waitUntil([&] { return !childrenOf(former.pid).empty(); }, patience));
         std::this_thread::sleep_for(milliseconds(500));
         ServiceRequest request(SessionPolicy::keep);
         storeFtp(plain, 2121, false);
@@ -100,7 +100,7 @@ TEST_F(UnderSystemd, aChangeHandsThePortOverAndKeepsTheSessions) {
         EXPECT_TRUE(isAlive(former)) << "it was not let look at its sockets, and ended at once";
         client.join();
         EXPECT_EQ(size, "20000000");
-        EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, std::chrono::seconds(5)));
+        EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, patience));
         // A supervisor that is killed is started again for the settings of now.
         const std::string hash = serviceState("ftpd").configurationHash;
         const ProcessId successor = serviceState("ftpd").daemon;

@@ -6,11 +6,13 @@
 #include "tests/support/waiting.h"
 
 #include <atomic>
+#include <chrono>
 
 namespace {
 
 using std::chrono::seconds;
 using velt::Severity;
+using velt::test::patience;
 using velt::test::waitUntil;
 
 const velt::Finding expires{"certificate-expires", Severity::warning, "ftp", "It expires soon.",
@@ -112,17 +114,17 @@ TEST_F(HostHealth, AStrangerLearnsThatTheHostLives) {
 
 TEST_F(HostHealth, AStrangerLearnsWhetherAllWorks) {
     start();
-    EXPECT_TRUE(waitUntil([this] { return probe("/readyz").status == 200; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([this] { return probe("/readyz").status == 200; }, patience));
     EXPECT_EQ(probe("/readyz").body, R"({"status":"ok"})");
     stop();
     fake.findings = {expires, remark};
     start();
-    EXPECT_TRUE(waitUntil([this] { return probe("/readyz").status == 200; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([this] { return probe("/readyz").status == 200; }, patience));
     stop();
     fake.findings = {down};
     start();
     EXPECT_EQ(probe("/readyz").status, 503) << "before the first judgement, too";
-    EXPECT_TRUE(waitUntil([this] { return probe("/readyz").body == R"({"status":"failed"})"; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([this] { return probe("/readyz").body == R"({"status":"failed"})"; }, patience));
     EXPECT_EQ(probe("/readyz").status, 503);
     EXPECT_EQ(get("/readyz").status, 503);
 }
@@ -139,7 +141,7 @@ TEST_F(HostHealth, FindingsAreMeasured) {
     fake.findings = {down, expires};
     start();
     const std::string error = R"(velt_health_findings{id="service-down",severity="error"} 1)";
-    EXPECT_TRUE(waitUntil([&] { return get("/metrics").body.find(error) != std::string::npos; }, seconds(5)));
+    EXPECT_TRUE(waitUntil([&] { return get("/metrics").body.find(error) != std::string::npos; }, patience));
     EXPECT_NE(
         get("/metrics").body.find(R"(velt_health_findings{id="certificate-expires",severity="warning"} 1)"),
         std::string::npos);

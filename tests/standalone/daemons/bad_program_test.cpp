@@ -31,8 +31,6 @@ namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
 
-using std::chrono::seconds;
-
 /// A daemon, as this test sees it: one service of the contract.
 struct Service {
     const char* name = "";
@@ -185,7 +183,7 @@ protected:
         EXPECT_TRUE(isServing(serviceState(service.service)));
         EXPECT_EQ(VLIBServiceStop(service.service, 0), 0) << lastErrorSentence();
         EXPECT_FALSE(accepts(port));
-        EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, seconds(2)));
+        EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, patience));
     }
 
     std::vector<std::string> replaced_;
@@ -249,7 +247,7 @@ TEST_P(BadDaemon, IsToldAndLeavesNothing) {
     const auto stop = Clock::now();
     EXPECT_EQ(VLIBServiceStop(service.service, 0), 0) << lastErrorSentence();
     EXPECT_LT(secondsSince(stop), 6.0);
-    EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, seconds(2)));
+    EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, patience));
     if (!misdeed.atTheLast) {
         expectTruth(messageOf(startEnabledServices()), port);
         EXPECT_EQ(VLIBServiceStop(service.service, 0), 0) << lastErrorSentence();

@@ -44,7 +44,7 @@ TEST_F(BannedSources, WhoIsBannedReachesNoLoginUntilTheTimeHasPassed) {
         EXPECT_FALSE(network_->neighbourReaches(2121));
         EXPECT_TRUE(network_->neighbourReaches(55600)) << "data of an open session";
         EXPECT_TRUE(network_->neighbourReaches(8080)) << "not ours";
-        EXPECT_TRUE(waitUntil([this] { return network_->neighbourReaches(2121); }, std::chrono::seconds(10)));
+        EXPECT_TRUE(waitUntil([this] { return network_->neighbourReaches(2121); }, patience));
     }
 }
 

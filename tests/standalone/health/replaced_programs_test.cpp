@@ -26,8 +26,7 @@ TEST(ReplacedPrograms, AreKnownByTheirFile) {
     }
     const std::string link = "/proc/" + std::to_string(child) + "/exe";
     std::error_code error;
-    ASSERT_TRUE(waitUntil([&] { return std::filesystem::read_symlink(link, error) == program; },
-                          std::chrono::seconds(5)));
+    ASSERT_TRUE(waitUntil([&] { return std::filesystem::read_symlink(link, error) == program; }, patience));
     EXPECT_EQ(replacedFileOf(child), std::nullopt);
     std::filesystem::copy_file("/usr/bin/sleep", program + ".new");
     std::filesystem::rename(program + ".new", program);

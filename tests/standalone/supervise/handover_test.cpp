@@ -66,7 +66,7 @@ TEST_F(HandOverTest, SessionsGoOnWithTheirFormerDaemonGone) {
     EXPECT_EQ(start("two"), (SessionCount{0, 1}));
     EXPECT_NE(daemonState(ftpDaemon).daemon, former);
     EXPECT_EQ(daemonState(ftpDaemon).configurationHash, "two");
-    EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, seconds(4)));
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, patience));
     EXPECT_EQ(listenersOn(port_), 1U);
     EXPECT_TRUE(client.isServed());
     EXPECT_TRUE(Client(port_).isServed());
@@ -132,7 +132,7 @@ TEST_F(HandOverTest, ADaemonThatDiesBeforeItListensLeavesNothing) {
     EXPECT_NE(messageOf(refused).find("did not listen"), std::string::npos) << messageOf(refused);
     EXPECT_TRUE(Client(port_).isServed());
     const DaemonState state = daemonState(ftpDaemon);
-    EXPECT_TRUE(waitUntil([&] { return childrenOf(state.supervisor.pid).size() == 1; }, seconds(2)));
+    EXPECT_TRUE(waitUntil([&] { return childrenOf(state.supervisor.pid).size() == 1; }, patience));
 }
 
 TEST_F(HandOverTest, WhatSharesNoPortIsStartedAgainWhenItsSuccessorFails) {
@@ -161,18 +161,18 @@ TEST_F(HandOverTest, ADaemonThatMovesListensBeforeTheFormerOneEnds) {
 TEST_F(HandOverTest, ManyLeaveNoProcessFileOrPort) {
     start("0");
     start("1");
-    ASSERT_TRUE(waitUntil([this] { return listenersOn(port_) == 1; }, seconds(4)));
+    ASSERT_TRUE(waitUntil([this] { return listenersOn(port_) == 1; }, patience));
     const ProcessId supervisor = daemonState(ftpDaemon).supervisor;
-    ASSERT_TRUE(waitUntil([&] { return childrenOf(supervisor.pid).size() == 1; }, seconds(2)));
+    ASSERT_TRUE(waitUntil([&] { return childrenOf(supervisor.pid).size() == 1; }, patience));
     const std::size_t files = filesOf(supervisor);
     const std::size_t entries = filesIn(root_);
     for (int i = 2; i < 12; ++i) {
         start(std::to_string(i));
     }
-    EXPECT_TRUE(waitUntil([this] { return listenersOn(port_) == 1; }, seconds(4)));
-    EXPECT_TRUE(waitUntil([&] { return childrenOf(supervisor.pid).size() == 1; }, seconds(2)));
-    EXPECT_TRUE(waitUntil([&] { return filesOf(supervisor) <= files; }, seconds(2)));
-    EXPECT_EQ(filesIn(root_), entries);
+    EXPECT_TRUE(waitUntil([this] { return listenersOn(port_) == 1; }, patience));
+    EXPECT_TRUE(waitUntil([&] { return childrenOf(supervisor.pid).size() == 1; }, patience));
+    EXPECT_TRUE(waitUntil([&] { return filesOf(supervisor) <= files; }, patience));
+    EXPECT_TRUE(waitUntil([&] { return filesIn(root_) == entries; }, patience)) << filesIn(root_);
 }
 
 TEST_F(HandOverTest, OfAKilledSupervisorTheNextOneEndsAllGenerations) {
@@ -182,7 +182,7 @@ TEST_F(HandOverTest, OfAKilledSupervisorTheNextOneEndsAllGenerations) {
     start("two");
     const DaemonState before = daemonState(ftpDaemon);
     signalProcess(before.supervisor, SIGKILL);
-    ASSERT_TRUE(waitUntil([&] { return !isAlive(before.supervisor); }, seconds(2)));
+    ASSERT_TRUE(waitUntil([&] { return !isAlive(before.supervisor); }, patience));
     start("three");
     EXPECT_FALSE(first.isServed());
     EXPECT_EQ(listenersOn(port_), 1U);
@@ -194,7 +194,7 @@ TEST_F(HandOverTest, ASupervisorThatIsKilledInTheMiddleLeavesNobodyBehind) {
     const ProcessId supervisor = daemonState(ftpDaemon).supervisor;
     const ControlRequest request{Command::start, testOrder(port_, "two", {"--share", "--delay", "400"})};
     std::thread asking([&] { (void)askSupervisor(statePath("/run/velt"), "ftpd", request, seconds(5)); });
-    EXPECT_TRUE(waitUntil([&] { return childrenOf(supervisor.pid).size() == 2; }, seconds(2)));
+    EXPECT_TRUE(waitUntil([&] { return childrenOf(supervisor.pid).size() == 2; }, patience));
     std::this_thread::sleep_for(milliseconds(100)); // it has begun to start
     signalProcess(supervisor, SIGKILL);
     asking.join();
@@ -212,7 +212,7 @@ TEST_F(HandOverTest, ACrashOfTheDaemonKeepsItsSessions) {
     signalProcess(former, SIGKILL);
     ASSERT_TRUE(waitUntil(
         [&] { return isServing(daemonState(ftpDaemon)) && daemonState(ftpDaemon).daemon != former; },
-        seconds(2)));
+        patience));
     EXPECT_TRUE(client.isServed());
     const auto stopped = ftp_.stop();
     EXPECT_EQ(stopped.valueOr({}), (SessionCount{1, 0}));

@@ -70,7 +70,7 @@ bool DaemonProcess::start(const DaemonOrder& order) {
         }
         return listens || pid_ < 0;
     };
-    waitUntil(listensOrEnded, std::chrono::seconds(5));
+    waitUntil(listensOrEnded, patience);
     if (!listens) {
         std::cerr << contentsOf(outputFile);
     }

@@ -84,7 +84,7 @@ bool isBack(const std::string& service, const ProcessId& former) {
             const DaemonState state = serviceState(service);
             return state.daemon != former && isServing(state);
         },
-        seconds(2));
+        patience);
 }
 
 std::string fetchByFtp(const std::string& path, int fromPort) {
@@ -110,7 +110,7 @@ SlowTransfer::SlowTransfer(int fromPort)
                                seconds(30));
       }) {
     std::error_code error;
-    EXPECT_TRUE(waitUntil([&] { return fs::exists(got) && fs::file_size(got, error) > 0; }, seconds(10)));
+    EXPECT_TRUE(waitUntil([&] { return fs::exists(got) && fs::file_size(got, error) > 0; }, patience));
 }
 
 SlowTransfer::~SlowTransfer() {
@@ -137,11 +137,7 @@ void installAndEnableHost() {
 }
 
 bool hostAnswers() {
-    return waitUntil(
-        [] {
-            return runProcess({"/usr/local/bin/veltctl", "status"}).exitCode == 0;
-        },
-        seconds(10));
+    return waitUntil([] { return runProcess({"/usr/local/bin/veltctl", "status"}).exitCode == 0; }, patience);
 }
 
 ProcessResult runSftp(int atPort, const std::string& commands) {
