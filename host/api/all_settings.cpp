@@ -54,8 +54,11 @@ std::vector<FieldError> ignoredParts(const Json::Value& wanted, const Json::Valu
     for (Json::ArrayIndex i = 0; i < wanted[rules].size(); ++i) {
         const auto isRule = [&](const Json::Value& each) { return each == wanted[rules][i]; };
         if (std::none_of(after[rules].begin(), after[rules].end(), isRule)) {
+            const Json::Value& rule = wanted[rules][i];
             errors.push_back({"/" + rules + "/" + std::to_string(i),
-                              "a user or group that exists, and a folder like /home or /SHARE/FOLDER"});
+                              "a user or group that exists, and a folder like /home or /SHARE/FOLDER; not " +
+                                  rule["type"].asString() + " " + rule["name"].asString() + " with " +
+                                  rule["path"].asString()});
         }
     }
     return errors;

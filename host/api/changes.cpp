@@ -1,6 +1,7 @@
 #include "host/api/changes.h"
 
 #include "base/json_value.h"
+#include "host/api/change_summary.h"
 #include "host/api/problem.h"
 #include "host/api/service_status.h"
 #include "host/base/json.h"
@@ -16,20 +17,6 @@ namespace {
 constexpr int logCategory = 2;
 constexpr int logLevel = 1;
 constexpr unsigned changedEvent = 0x11BF0003;
-
-std::string textOf(const Json::Value& value) {
-    return value.isArray() ? std::to_string(value.size()) + " rules" : toJson(value);
-}
-
-/// "/ftp/timeout 300 to 600, /ftp/portnum 21 to 2121"
-std::string summaryOf(const std::vector<FieldChange>& changes) {
-    std::string text;
-    for (const FieldChange& change : changes) {
-        text += (text.empty() ? "" : ", ") + change.field + " from " + textOf(change.from) + " to " +
-                textOf(change.to);
-    }
-    return text;
-}
 
 /// A change that the platform could not do, though the module accepted it.
 HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId) {

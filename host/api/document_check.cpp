@@ -214,7 +214,9 @@ void checkRules(const Json::Value& rules, Errors& errors) {
         if (auto fault = faultOfRule(rules[i], place)) {
             errors.push_back(std::move(*fault));
         } else if (!owners.emplace(rules[i]["type"].asString(), rules[i]["name"].asString()).second) {
-            errors.push_back({place + "/name", "one rule for each " + rules[i]["type"].asString()});
+            const std::string type = rules[i]["type"].asString();
+            errors.push_back({place + "/name", "one rule for each " + type + ", not a second one for " +
+                                                   rules[i]["name"].asString()});
         }
     }
 }

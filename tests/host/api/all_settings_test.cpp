@@ -1,4 +1,6 @@
 // All settings as one document.
+#include "base/json_value.h"
+#include "host/api/change_summary.h"
 #include "host/api/document_check.h"
 #include "host/base/json.h"
 #include "tests/host/fake_standalone.h"
@@ -150,6 +152,37 @@ TEST_F(HostSettings, ARuleForSomebodyUnknownIsNamed) {
     const Answer answer = patch(R"({"chroot_rules":[{"type":"user","name":"nobody-knows","path":"/home"}]})");
     EXPECT_EQ(answer.status, 422) << answer.body;
     EXPECT_EQ(fieldsOf(answer), Fields{"/chroot_rules/0"}) << answer.body;
+    EXPECT_NE(answer.body.find("not user nobody-knows with /home"), std::string::npos) << answer.body;
+}
+
+TEST_F(HostSettings, AChangeOfRulesIsWrittenDownRuleByRule) {
+    platform.users["anna"].uid = 1001;
+    platform.groups["staff"] = 100;
+    const auto stored = [&](const std::string& rules) {
+        EXPECT_EQ(patch(R"({"chroot_rules":)" + rules + "}").status, 200);
+        return access.audit.back();
+    };
+    const std::string user = R"({"type":"user","name":"anna","path":"/home"})";
+    const std::string group = R"({"type":"group","name":"staff","path":"/docs"})";
+    EXPECT_EQ(stored("[" + user + "," + group + "]"),
+              "settings: /chroot_rules (added user anna /home, group staff /docs)");
+    EXPECT_EQ(stored("[" + group + "," + user + "]"), "settings: /chroot_rules (in another order)");
+    EXPECT_EQ(stored(R"([{"type":"user","name":"anna","path":"/docs"}])"),
+              "settings: /chroot_rules (removed group staff /docs, user anna /home; added user anna /docs)");
+}
+
+TEST(ChangeSummaryTest, OfManyRulesTheFirstAreNamed) {
+    Json::Value rules(Json::arrayValue);
+    for (int i = 0; i < 200; ++i) {
+        rules.append(
+            velt::jsonObject({{"type", "user"}, {"name", "u" + std::to_string(i)}, {"path", "/home"}}));
+    }
+    const std::string text =
+        velt::host::summaryOf({{"/ftp/timeout", 1, 2}, {"/chroot_rules", rules, Json::arrayValue}});
+    EXPECT_TRUE(
+        text.starts_with("/ftp/timeout from 1 to 2, /chroot_rules (removed user u0 /home, user u1 /home"))
+        << text;
+    EXPECT_TRUE(text.ends_with("user u19 /home and 180 more)")) << text;
 }
 
 TEST_F(HostSettings, ATakenPortIsAConflictOfItsField) {
