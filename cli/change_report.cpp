@@ -7,7 +7,9 @@
 #include <CLI/CLI.hpp>
 
 #include <algorithm>
+#include <iterator>
 #include <ostream>
+#include <vector>
 
 namespace velt::cli {
 
@@ -28,21 +30,37 @@ bool holds(const Json::Value& list, const Json::Value& wanted) {
     return std::ranges::any_of(list, [&](const Json::Value& each) { return each == wanted; });
 }
 
-/// A line for each rule that comes or goes.
+/// "user anna", whom a rule is for.
+std::string ownerOf(const Json::Value& rule) {
+    return printable(textAt(rule, "type") + " " + textAt(rule, "name"));
+}
+
+/// The rules of the one list that the other does not hold.
+std::vector<Json::Value> missingFrom(const Json::Value& others, const Json::Value& rules) {
+    std::vector<Json::Value> missing;
+    std::ranges::copy_if(rules, std::back_inserter(missing),
+                         [&](const Json::Value& rule) { return !holds(others, rule); });
+    return missing;
+}
+
+/// A line for each rule that comes, goes, or replaces one of the same user or group.
 void writeRuleChanges(std::ostream& out, const std::string& name, const Json::Value& change) {
-    bool moved = true;
-    const auto write = [&](const char* what, const Json::Value& rules, const Json::Value& others) {
-        for (const Json::Value& rule : rules) {
-            if (!holds(others, rule)) {
-                out << name << ": " << what << ' ' << ruleText(rule) << '\n';
-                moved = false;
-            }
-        }
-    };
-    write("remove", change["from"], change["to"]);
-    write("add", change["to"], change["from"]);
-    if (moved) {
+    const std::vector<Json::Value> gone = missingFrom(change["to"], change["from"]);
+    std::vector<Json::Value> come = missingFrom(change["from"], change["to"]);
+    if (gone.empty() && come.empty()) {
         out << name << ": the same rules in another order\n";
+    }
+    for (const Json::Value& rule : gone) {
+        const auto next = std::ranges::find(come, ownerOf(rule), ownerOf);
+        if (next == come.end()) {
+            out << name << ": remove " << ruleText(rule) << '\n';
+        } else {
+            out << name << ": " << ruleText(rule) << " -> " << printable(textAt(*next, "path")) << '\n';
+            come.erase(next);
+        }
+    }
+    for (const Json::Value& rule : come) {
+        out << name << ": add " << ruleText(rule) << '\n';
     }
 }
 

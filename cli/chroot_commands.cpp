@@ -1,16 +1,14 @@
 #include "base/json_value.h"
-#include "base/printable.h"
-#include "cli/change_report.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
+#include "cli/rule_change.h"
 #include "cli/rule_list.h"
 #include "cli/text_table.h"
 
 #include <CLI/CLI.hpp>
 
 #include <algorithm>
-#include <functional>
 #include <memory>
 
 namespace velt::cli {
@@ -36,10 +34,6 @@ void showRules(Context& context) {
     table.write(context.console.out);
 }
 
-Json::Value patchOf(const ChrootRules& rules) {
-    return jsonObject({{"chroot_rules", rulesToJson(rules)}});
-}
-
 void replaceRules(Context& context, const RuleOptions& options) {
     const Json::Value document = readJsonFile(context.console, options.file);
     std::vector<std::string> faults;
@@ -50,19 +44,7 @@ void replaceRules(Context& context, const RuleOptions& options) {
                       "Correct them; 'veltctl chroot rules load --json' shows how rules are written.",
                       faults);
     }
-    changeSettings(context, patchOf(rules), options.change);
-}
-
-/// Changes the rules that are stored; once more, when others change them meanwhile.
-void changeRules(Context& context, const ChangeOptions& options,
-                 const std::function<void(ChrootRules&)>& change) {
-    Json::Value report;
-    context.api.changeWhatWasRead([&] {
-        ChrootRules rules = loadRules(context.api);
-        change(rules);
-        report = context.api.patch(settingsPath + options.query(), patchOf(rules));
-    });
-    writeReport(context, report);
+    changeSettings(context, jsonObject({{"chroot_rules", rulesToJson(rules)}}), options.change);
 }
 
 void addRule(Context& context, const RuleOptions& options) {
@@ -70,7 +52,7 @@ void addRule(Context& context, const RuleOptions& options) {
         throw Failure(ExitCode::usage, "Invalid rule: " + *fault + ".",
                       "Write it as in 'veltctl chroot rules add user NAME /SHARE'.");
     }
-    changeRules(context, options.change, [&](ChrootRules& rules) {
+    changeRules(context, options.change, [&](ChrootRules& rules, const Json::Value&) {
         if (std::ranges::find(rules, options.rule) == rules.end()) {
             rules.push_back(options.rule);
         }
@@ -92,79 +74,8 @@ void removeFrom(ChrootRules& rules, const ChrootRule& wanted) {
 }
 
 void removeRule(Context& context, const RuleOptions& options) {
-    changeRules(context, options.change, [&](ChrootRules& rules) { removeFrom(rules, options.rule); });
-}
-
-struct UserOptions {
-    bool others = false;
-    int offset = 0;
-    int limit = -1;
-    std::string source = "local";
-    std::string domain;
-    std::string filter;
-    std::vector<std::string> names;
-};
-
-void listUsers(Context& context, const UserOptions& options) {
-    Json::Value parameters = jsonObject({{"chroot", !options.others},
-                                         {"offset", options.offset},
-                                         {"limit", options.limit},
-                                         {"type", options.source}});
-    if (!options.domain.empty()) {
-        parameters["domain_name"] = options.domain;
-    }
-    if (!options.filter.empty()) {
-        parameters["substr"] = options.filter;
-    }
-    const Json::Value answer = context.api.call({chrootApi, 1, "list"}, parameters);
-    if (context.wroteJson(answer)) {
-        return;
-    }
-    Table table({"USER", "DESCRIPTION"});
-    for (const Json::Value& user : answer["user"]) {
-        table.add({textAt(user, "name"), textAt(user, "descr")});
-    }
-    table.write(context.console.out);
-    context.console.out << answer["user"].size() << " of " << textAt(answer, "total") << " users\n";
-}
-
-void changeUsers(Context& context, const UserOptions& options, const char* method, const char* sentence) {
-    const Json::Value parameters = jsonObject({{"id", jsonArray(options.names, std::identity())}});
-    const Json::Value answer = context.api.call({chrootApi, 1, method}, parameters);
-    if (context.wroteJson(answer.isNull() ? parameters : answer)) {
-        return;
-    }
-    for (const std::string& name : options.names) {
-        context.console.out << printable(name) << sentence << '\n';
-    }
-}
-
-void addUserCommands(CLI::App& chroot, Command& chosen) {
-    auto options = std::make_shared<UserOptions>();
-    CLI::App* users = chroot.add_subcommand("users", "Users who are confined to their home folders");
-    users->require_subcommand(1);
-    CLI::App* list = users->add_subcommand("list", "List the confined users");
-    list->add_flag("--others", options->others, "List the users who are not confined");
-    list->add_option("--offset", options->offset, "Number of users to skip")->type_name("N");
-    list->add_option("--limit", options->limit, "Number of users to list (default: all)")->type_name("N");
-    list->add_option("--type", options->source, "Where the users come from (default local)")
-        ->check(CLI::IsMember({"local", "domain", "ldap", "all"}))
-        ->type_name("local|domain|ldap|all");
-    list->add_option("--domain", options->domain, "Only users of this domain")->type_name("NAME");
-    list->add_option("--filter", options->filter, "Only users whose name contains this text")
-        ->type_name("TEXT");
-    onWords(list, chosen, [options](Context& context) { listUsers(context, *options); });
-
-    CLI::App* add = users->add_subcommand("add", "Confine users to their home folders");
-    CLI::App* remove = users->add_subcommand("delete", "Stop confining users to their home folders");
-    for (CLI::App* command : {add, remove}) {
-        command->add_option("user", options->names, "Name of a user, or several")->required()->type_name("");
-    }
-    onWords(add, chosen,
-            [options](Context& context) { changeUsers(context, *options, "add", ": confined"); });
-    onWords(remove, chosen, [options](Context& context) {
-        changeUsers(context, *options, "delete", ": no longer confined");
-    });
+    changeRules(context, options.change,
+                [&](ChrootRules& rules, const Json::Value&) { removeFrom(rules, options.rule); });
 }
 
 void addRuleCommands(CLI::App& chroot, Command& chosen) {
@@ -206,7 +117,7 @@ void addRuleCommands(CLI::App& chroot, Command& chosen) {
 void addChrootCommands(CLI::App& app, Command& chosen) {
     CLI::App* chroot = app.add_subcommand("chroot", "Confine users and groups to folders");
     chroot->require_subcommand(1);
-    addUserCommands(*chroot, chosen);
+    addChrootUserCommands(*chroot, chosen);
     addRuleCommands(*chroot, chosen);
 }
 

@@ -35,6 +35,7 @@ void onWords(CLI::App* words, Command& chosen, const Command& command);
 void addSettingsCommands(CLI::App& app, Command& chosen);
 void addShareCommands(CLI::App& app, Command& chosen);
 void addChrootCommands(CLI::App& app, Command& chosen);
+void addChrootUserCommands(CLI::App& chroot, Command& chosen); ///< below "chroot"
 void addStatusCommands(CLI::App& app, Command& chosen);
 void addDoctorCommand(CLI::App& app, Command& chosen);
 void addLogCommand(CLI::App& app, Command& chosen);

@@ -1,7 +1,6 @@
 #include "cli/rule_list.h"
 
 #include "base/json_value.h"
-#include "cli/change_report.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
 #include "cli/server_refusal.h"
@@ -60,13 +59,12 @@ ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& fa
     return rules;
 }
 
-ChrootRules loadRules(ApiClient& api) {
-    const Json::Value answer = api.get(settingsPath);
+ChrootRules rulesOf(const Json::Value& settings) {
     ChrootRules rules;
-    if (!answer.isObject() || !answer["chroot_rules"].isArray()) {
+    if (!settings.isObject() || !settings["chroot_rules"].isArray()) {
         throw unexpectedAnswer("The server's answer contains no chroot rules.");
     }
-    for (const Json::Value& rule : answer["chroot_rules"]) {
+    for (const Json::Value& rule : settings["chroot_rules"]) {
         rules.push_back(ruleFromJson(rule));
     }
     return rules;

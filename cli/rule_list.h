@@ -29,8 +29,8 @@ std::optional<std::string> faultOf(const ChrootRule& rule);
 /// array is added to `faults`, in words.
 ChrootRules rulesFromJson(const Json::Value& array, std::vector<std::string>& faults);
 
-/// What the server has stored, by its settings.
-ChrootRules loadRules(ApiClient& api);
+/// The rules in the server's document of all settings. Failure when it has none.
+ChrootRules rulesOf(const Json::Value& settings);
 
 } // namespace velt::cli
 

@@ -28,7 +28,8 @@ _veltctl_options() {
         log) echo '--since --event --actor --before --limit --all --follow' ;;
         events) echo '--count --kind' ;;
         'ftp get') echo '--api-version' ;;
-        'ftp set' | 'security set' | 'sftp set' | 'chroot rules save' | 'chroot rules add' | 'chroot rules remove' | undo | import)
+        'ftp set' | 'security set' | 'sftp set' | 'chroot users add' | 'chroot users delete' | 'chroot rules save' | \
+            'chroot rules add' | 'chroot rules remove' | undo | import)
             echo '--dry-run --keep-sessions --end-sessions --confirm-within' ;;
         history) echo '--before --limit' ;;
         restart) echo '--end-sessions' ;;

@@ -5,6 +5,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/core/paths.h"
 #include "standalone/ports/port_range.h"
+#include "standalone/process/process_identity.h"
 
 #include <algorithm>
 #include <array>
@@ -55,8 +56,17 @@ ProgramStep storeStep(const StagedFile& file) {
             }};
 }
 
+/// As its supervisor counts them: one process each, of the daemon or left behind by a former one. The state
+/// file has those of the moment when it was written only.
 int sessionsOf(const Daemon& daemon) {
-    return static_cast<int>(daemonState(daemon).sessions.size());
+    const DaemonState state = daemonState(daemon);
+    if (!isAlive(state.supervisor)) {
+        return 0;
+    }
+    std::vector<ProcessId> sessions = childrenOf(state.supervisor.pid);
+    std::erase(sessions, state.daemon);
+    const auto own = state.daemon ? childrenOf(state.daemon.pid) : std::vector<ProcessId>();
+    return static_cast<int>(sessions.size() + own.size());
 }
 
 /// Does it with the daemon, and tells how many of its sessions that ended.
@@ -178,7 +188,7 @@ std::vector<ProgramStep> programOf(const StagedRequest& request) {
     addDaemonSteps(request, program);
     const bool concerned =
         std::ranges::find(request.wishes, &ftpDaemon, &Wish::daemon) != request.wishes.end();
-    if (request.takesFtpRights && !concerned && request.policy == SessionPolicy::byChange &&
+    if (request.takesFtpRights && !concerned && request.policy != SessionPolicy::keep &&
         sessionsOf(ftpDaemon) > 0) {
         program.push_back(endSessionsStep(ftpDaemon));
     }

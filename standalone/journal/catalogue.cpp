@@ -25,7 +25,9 @@ constexpr std::array<CatalogueEntry, 28> entries{{
     {0x11B00021, "UTF-8 file names in the FTP service were set to \"%1\"."},
     {0x11B00022, "The limit of FTP connections from one address was set to \"%1\"."},
     {0x11B00024, "User \"%1\" was confined to the home folder in the FTP service."},
-    {0x11B00025, "User \"%1\" is no longer confined to the home folder in the FTP service."},
+    // Written also for users who had no rule, or have another one.
+    {0x11B00025,
+     "User \"%1\" is not among those whom a rule confines to the home folder in the FTP service."},
     {0x11B00026, "Confining anonymous FTP users to one share was %1."},
     {0x11B00027, "Confining FTP users to their home folders was set to \"%1\"."},
     {0x11B00028, "The share that anonymous FTP users are confined to was set to \"%1\"."},

@@ -3,8 +3,6 @@
 namespace {
 
 constexpr const char* usersList = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/list";
-constexpr const char* usersAdd = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/add";
-constexpr const char* usersDelete = "POST /api/VELT.Core.FileServ.FTP.ChrootUser/v1/delete";
 
 HttpReply json(const std::string& body) {
     return {200, body, "application/json", false, false};
@@ -43,17 +41,72 @@ TEST_F(ChrootTest, TheListTakesAPageASourceAndFilters) {
     EXPECT_EQ(run({"chroot", "users", "list", "--type", "nis"}).code, 2);
 }
 
+TEST_F(ChrootTest, TheListSaysThatTheOthersAreConfinedAsWell) {
+    host.security["user_chroot"] = true;
+    host.answerWith(usersList, json(R"({"total": 0, "user": []})"));
+    EXPECT_EQ(run({"chroot", "users", "list"}).out,
+              "USER  DESCRIPTION\n0 of 0 users\n"
+              "user_chroot is on: users without a rule are confined to their home folders, too.\n");
+    EXPECT_NE(run({"chroot", "users", "list", "--others"})
+                  .out.find("unless a rule says otherwise, these users are confined"),
+              std::string::npos);
+    EXPECT_EQ(jsonOf(run({"chroot", "users", "list", "--json"}).out)["user_chroot"], true);
+}
+
 TEST_F(ChrootTest, UsersAreConfinedAndReleased) {
-    host.answerWith(usersAdd, json(R"({"chrootuser_id": ["anna", "status"]})"));
-    host.answerWith(usersDelete, HttpReply{204, "", "", false, false});
-    // A user may be called like a command.
-    EXPECT_EQ(run({"chroot", "users", "add", "anna", "status"}).out, "anna: confined\nstatus: confined\n");
-    EXPECT_EQ(sent(usersAdd).at(0), jsonOf(R"({"id": ["anna", "status"]})"));
-    EXPECT_EQ(run({"chroot", "users", "delete", "anna"}).out, "anna: no longer confined\n");
-    EXPECT_EQ(sent(usersDelete).at(0), jsonOf(R"({"id": ["anna"]})"));
-    EXPECT_EQ(jsonOf(run({"--json", "chroot", "users", "add", "anna"}).out)["chrootuser_id"][0], "anna");
-    EXPECT_EQ(jsonOf(run({"--json", "chroot", "users", "delete", "anna"}).out)["id"][0], "anna");
+    host.accounts.insert("status"); // a user may be called like a command
+    EXPECT_EQ(run({"chroot", "users", "add", "ben", "status", "ben"}).out,
+              "chroot_rules: add user ben /home\nchroot_rules: add user status /home\n");
+    EXPECT_EQ(run({"chroot", "users", "add", "ben"}).out, "Nothing changed.\n");
+    EXPECT_EQ(run({"chroot", "users", "delete", "ben", "ben"}).out, "chroot_rules: remove user ben /home\n");
+    EXPECT_EQ(jsonOf(run({"--json", "chroot", "users", "delete", "status"}).out)["changes"].size(), 1U);
+    EXPECT_EQ(host.rules.size(), 2U);
     EXPECT_EQ(run({"chroot", "users", "add"}).code, 2);
+}
+
+TEST_F(ChrootTest, TheOtherRuleOfAConfinedUserIsSaidToBeReplaced) {
+    host.rules.append(jsonOf(R"({"type": "user", "name": "anna", "path": "/later"})"));
+    EXPECT_EQ(run({"chroot", "users", "add", "anna"}).out,
+              "chroot_rules: user anna /docs -> /home\nchroot_rules: remove user anna /later\n");
+    EXPECT_EQ(host.rules[0], jsonOf(R"({"type": "user", "name": "anna", "path": "/home"})"));
+    EXPECT_EQ(host.rules.size(), 2U);
+}
+
+TEST_F(ChrootTest, WhoIsNotConfinedIsNotReleased) {
+    const RunResult result = run({"chroot", "users", "delete", "anna"});
+    EXPECT_EQ(result.code, 3);
+    EXPECT_EQ(result.err, "veltctl: There is no rule that confines the user anna to the home folder.\n"
+                          "  Nothing was changed.\n"
+                          "  The rule of this user is for /docs.\n"
+                          "What to do: See 'veltctl chroot rules load' for the rules.\n");
+    host.security["user_chroot"] = true;
+    EXPECT_NE(run({"chroot", "users", "delete", "ben"})
+                  .err.find("  user_chroot is on, which confines all users without a rule.\n"),
+              std::string::npos);
+    EXPECT_EQ(run({"chroot", "users", "delete", "staff"}).code, 3); // a group
+    EXPECT_TRUE(sent(change).empty());
+}
+
+TEST_F(ChrootTest, WhoIsReleasedFromARuleIsToldOfTheGeneralSetting) {
+    host.security["user_chroot"] = true;
+    host.rules = jsonOf(R"([{"type": "user", "name": "anna", "path": "/home"}])");
+    EXPECT_EQ(run({"chroot", "users", "delete", "anna"}).out,
+              "chroot_rules: remove user anna /home\n"
+              "user_chroot is on: users without a rule are confined to their home folders.\n");
+}
+
+TEST_F(ChrootTest, UsersAreConfinedAsOtherSettingsAreChanged) {
+    const RunResult result = run({"chroot", "users", "add", "ben", "--dry-run"});
+    EXPECT_EQ(result.code, 7);
+    EXPECT_EQ(result.out, "chroot_rules: add user ben /home\nNothing was changed: this was a dry run.\n");
+    EXPECT_EQ(run({"chroot", "users", "add", "ben", "--keep-sessions", "--confirm-within", "60"}).code, 0);
+    EXPECT_EQ(sent("PATCH /api/settings?sessions=keep&confirm_within=60").size(), 1U);
+    EXPECT_EQ(run({"chroot", "users", "delete", "ben", "--end-sessions"}).code, 0);
+    EXPECT_EQ(sent("PATCH /api/settings?sessions=end").size(), 1U);
+    host.etag = "\"a-1\"";
+    host.outdated = 1; // somebody else adds a rule first
+    EXPECT_EQ(run({"chroot", "users", "add", "anna"}).code, 0);
+    EXPECT_EQ(host.rules.size(), 3U);
 }
 
 TEST_F(ChrootTest, RulesAreShown) {

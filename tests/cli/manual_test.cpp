@@ -46,7 +46,7 @@ TEST(ManualTest, ThePageNamesEveryExitCode) {
     const std::string page = rendered();
     for (const char* code :
          {" 0 Done", " 1 A file", " 2 The command line", " 3 The input was refused", " 4 The input conflicts",
-          " 5 The server failed", " 6 The server cannot", " 8 Done"}) {
+          " 5 The server failed", " 6 The server cannot", " 7 A dry run", " 8 Done"}) {
         EXPECT_NE(page.find(code), std::string::npos) << code;
     }
 }

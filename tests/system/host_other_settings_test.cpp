@@ -1,4 +1,5 @@
 // The security, chroot and SFTP settings by veltctl and by curl, seen by clients.
+#include "tests/support/waiting.h"
 #include "tests/system/support/daemon_process.h"
 #include "tests/system/support/setting_table.h"
 
@@ -90,20 +91,51 @@ TEST_F(HostOther, confinedUsers) {
     done({"security", "set", "user_chroot=off"});
     const std::string open = rootOf("alice");
     EXPECT_NE(open, homeOnly);
-    EXPECT_EQ(done({"chroot", "users", "add", "alice"}), "alice: confined\n");
+    // A session of before may be about to end.
+    EXPECT_EQ(done({"chroot", "users", "add", "alice", "--keep-sessions"}),
+              "chroot_rules: add user alice /home\n");
     EXPECT_EQ(rootOf("alice"), homeOnly);
     EXPECT_EQ(curl(usersApi + std::string("add"), R"({"id": ["bob"]})").status, 200);
     EXPECT_EQ(rootOf("bob"), homeOnly);
-    const Json::Value listed = curl(usersApi + std::string("list"), R"({"chroot": true})").json;
+    Json::Value listed = curl(usersApi + std::string("list"), R"({"chroot": true})").json;
     EXPECT_EQ(listed["total"], 2);
+    listed["user_chroot"] = false;
     EXPECT_EQ(listed, jsonOf(done({"chroot", "users", "list", "--json"})));
     EXPECT_EQ(
         jsonOf(done({"chroot", "users", "list", "--others", "--filter", "car", "--json"}))["user"][0]["name"],
         "carol");
     EXPECT_EQ(curl(usersApi + std::string("delete"), R"({"id": ["alice"]})").status, 204);
     EXPECT_EQ(rootOf("alice"), open);
-    EXPECT_EQ(done({"chroot", "users", "delete", "bob"}), "bob: no longer confined\n");
+    EXPECT_EQ(done({"chroot", "users", "delete", "bob", "--keep-sessions"}),
+              "chroot_rules: remove user bob /home\n");
     EXPECT_EQ(rootOf("bob"), open);
+}
+
+TEST_F(HostOther, aDryRunCountsTheSessionsOfNow) {
+    const auto wouldEnd = [](int sessions) {
+        const ProcessResult plan = veltctl({"chroot", "users", "add", "bob", "--dry-run", "--json"});
+        return jsonOf(plan.output)["sessions_ended"] == sessions;
+    };
+    const auto settlesAt = [&](int sessions) {
+        return waitUntil([&] { return wouldEnd(sessions); }, patience); // one of before may be about to end
+    };
+    EXPECT_TRUE(settlesAt(0));
+    const FtpSession first = aliceAt();
+    EXPECT_TRUE(settlesAt(1));
+    const FtpSession second = aliceAt();
+    EXPECT_TRUE(wouldEnd(2));
+}
+
+TEST_F(HostOther, aChangeOfRulesEndsTheSessionsUnlessToldNotTo) {
+    const auto survives = [](const Words& change) {
+        FtpSession session = aliceAt();
+        EXPECT_EQ(session.command("NOOP").code, 200);
+        done(change);
+        return session.command("NOOP").code == 200;
+    };
+    EXPECT_TRUE(survives({"chroot", "users", "add", "bob", "--keep-sessions"}));
+    EXPECT_FALSE(survives({"chroot", "users", "delete", "bob"}));
+    EXPECT_FALSE(survives({"chroot", "users", "add", "bob", "--end-sessions"}));
 }
 
 TEST_F(HostOther, rules) {
