@@ -1,5 +1,7 @@
 #include "tests/support/fault_sweep.h"
 
+#include "tests/support/waiting.h"
+
 #include <gtest/gtest.h>
 
 #include <unistd.h>
@@ -71,22 +73,47 @@ bool triesAll() {
     return std::getenv("VELT_ALL_FAULTS") != nullptr;
 }
 
+using Look = std::function<void(const ChildEnd& end)>;
+
+ChildEnd askServer(const FaultSweep& sweep, CallWatch::Decide decide) {
+    const auto began = Clock::now();
+    sweep.server->decideBy(std::move(decide));
+    ChildEnd end{true, 0, sweep.act()};
+    sweep.server->decideBy({});
+    end.inTime = Clock::now() - began <= sweep.limit;
+    return end;
+}
+
+/// Does the operation once, and looks at what has become of it.
+void runOnce(const FaultSweep& sweep, CallWatch::Decide decide, const Look& look) {
+    sweep.prepare();
+    if (sweep.server != nullptr) {
+        look(askServer(sweep, std::move(decide)));
+        return;
+    }
+    CallWatch watch(sweep.act, std::move(decide));
+    if (sweep.meanwhile) {
+        sweep.meanwhile(watch.child());
+    }
+    const ChildEnd end = watch.finish(sweep.limit);
+    watch.decideBy({});
+    look(end);
+}
+
 std::vector<Fault> learnFaults(const FaultSweep& sweep) {
     std::vector<Fault> all;
-    sweep.prepare();
     Counter counter(sweep);
-    CallWatch watch(sweep.act, [&](const SeenCall& call) {
+    const auto note = [&](const SeenCall& call) {
         if (Fault fault = counter.next(call); !fault.label.empty()) {
             all.push_back(std::move(fault));
         }
         return 0;
+    };
+    runOnce(sweep, note, [&](const ChildEnd& end) {
+        SCOPED_TRACE("no fault");
+        EXPECT_TRUE(end.inTime);
+        sweep.check({"no fault", {}, end});
     });
-    const ChildEnd end = watch.finish(sweep.limit);
-    EXPECT_TRUE(end.inTime) << "without a fault";
-    SweptRun run{"no fault", {}, end};
-    SCOPED_TRACE(run.fault);
-    watch.decideBy({});
-    sweep.check(run);
     return all;
 }
 
@@ -102,7 +129,7 @@ std::vector<Fault> withFurtherErrors(const std::vector<Fault>& faults) {
     return all;
 }
 
-std::vector<Fault> chooseFaults(const std::vector<Fault>& all) {
+std::vector<Fault> chooseFaults(const std::vector<Fault>& all, bool briefly) {
     if (triesAll()) {
         return withFurtherErrors(all);
     }
@@ -112,19 +139,19 @@ std::vector<Fault> chooseFaults(const std::vector<Fault>& all) {
     }
     std::vector<Fault> chosen;
     std::ranges::copy_if(all, std::back_inserter(chosen), [&](const Fault& fault) {
-        return fault.occurrence == 0 || fault.occurrence == last[fault.label];
+        return fault.occurrence == 0 || (!briefly && fault.occurrence == last[fault.label]);
     });
     return chosen;
 }
 
 /// Whether the call came.
 bool runWith(const Fault& fault, const FaultSweep& sweep) {
-    sweep.prepare();
-    SweptRun run;
+    SweptRun run{
+        fault.label + " (" + std::to_string(fault.occurrence) + "): " + std::strerror(fault.error), {}, {}};
     std::mutex mutex; // of run.call and of came
     bool came = false;
     Counter counter(sweep);
-    CallWatch watch(sweep.act, [&](const SeenCall& call) {
+    const auto failOne = [&](const SeenCall& call) {
         const Fault here = counter.next(call);
         const std::lock_guard lock(mutex);
         if (came || here.label != fault.label || here.occurrence != fault.occurrence) {
@@ -133,16 +160,16 @@ bool runWith(const Fault& fault, const FaultSweep& sweep) {
         came = true;
         run.call = call;
         return fault.error;
+    };
+    runOnce(sweep, failOne, [&](const ChildEnd& end) {
+        const std::lock_guard lock(mutex);
+        SCOPED_TRACE(run.fault);
+        EXPECT_TRUE(end.inTime);
+        run.end = end;
+        if (came) {
+            sweep.check(run);
+        }
     });
-    run.end = watch.finish(sweep.limit);
-    watch.decideBy({});
-    const std::lock_guard lock(mutex);
-    run.fault = fault.label + " (" + std::to_string(fault.occurrence) + "): " + std::strerror(fault.error);
-    SCOPED_TRACE(run.fault);
-    EXPECT_TRUE(run.end.inTime);
-    if (came) {
-        sweep.check(run);
-    }
     return came;
 }
 
@@ -161,10 +188,11 @@ bool isLoading(const SeenCall& call) {
 
 int sweepFaults(const FaultSweep& sweep) {
     int tried = 0;
-    for (const Fault& fault : chooseFaults(learnFaults(sweep))) {
+    for (const Fault& fault : chooseFaults(learnFaults(sweep), sweep.briefly)) {
         tried += runWith(fault, sweep) ? 1 : 0;
     }
     testing::Test::RecordProperty("faults", tried);
+    std::printf("FAULTS %d\n", tried);
     return tried;
 }
 

@@ -24,12 +24,21 @@ struct FaultSweep {
     /// The operation, in a child for each run.
     std::function<std::string()> act;
 
+    /// While it runs, in this process: asks something of it, say, and ends one that would go on.
+    std::function<void(pid_t child)> meanwhile;
+
+    /// A process that serves: its calls are failed, and the operation is done in this process.
+    CallWatch* server = nullptr;
+
     /// Which calls are failed; all but those of isLoading when empty.
     std::function<bool(const SeenCall&)> counts;
 
-    /// After each run in which a call has failed, in this process. What the child has started may still run;
-    /// nothing of it must be left at the end.
+    /// After each run in which a call has failed, and the first without, in this process. What the child has
+    /// started may still run; nothing of it must be left at the end.
     std::function<void(const SweptRun&)> check;
+
+    /// Of calls that differ in numbers alone, fails the first alone.
+    bool briefly = false;
 
     std::chrono::milliseconds limit{10'000}; ///< for one run; the test fails past it
 };
