@@ -69,9 +69,11 @@ Result<> storeSftpSettings(const SftpSettings& settings) {
 
 Result<> writeMissingSettings() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    if (!fileExists(statePath(paths::ftpSettings)))
+    VELT_ASSIGN_OR_RETURN(const bool hasFtp, isThere(statePath(paths::ftpSettings)));
+    if (!hasFtp)
         VELT_RETURN_IF_ERROR(storeFtpSettings(defaultFtpSettings()));
-    return fileExists(statePath(paths::sftpSettings)) ? Result<>() : storeSftpSettings(defaultSftpSettings());
+    VELT_ASSIGN_OR_RETURN(const bool hasSftp, isThere(statePath(paths::sftpSettings)));
+    return hasSftp ? Result<>() : storeSftpSettings(defaultSftpSettings());
 }
 
 } // namespace velt
