@@ -97,6 +97,7 @@ ChangeOutcome runChange(const StagedRequest& request, const std::vector<ProgramS
     const FormerStates former = statesOf(request.wishes);
     const auto noted = request.files.empty() ? Result<>() : noteChange(request.files);
     if (!noted) {
+        (void)forgetChange(); // it may be there all the same, for the next start to go by
         return {{}, noted.error()};
     }
     if (auto done = doSteps(program, std::move(lock), outcome); !done) {
