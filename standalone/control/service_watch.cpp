@@ -19,6 +19,7 @@
 #include <algorithm>
 #include <array>
 #include <atomic>
+#include <cerrno>
 #include <cstdint>
 #include <exception>
 #include <functional>
@@ -141,6 +142,9 @@ private:
 class StateFolderWatch {
 public:
     StateFolderWatch() : notify_(::inotify_init1(IN_CLOEXEC | IN_NONBLOCK)), end_(::eventfd(0, EFD_CLOEXEC)) {
+        if (!end_) {
+            throw std::system_error(errno, std::generic_category()); // nobody could end the watch
+        }
         if (const auto folder = runFolder(); folder && notify_) {
             ::inotify_add_watch(notify_.get(), folder->c_str(), IN_MOVED_TO | IN_DELETE);
         }
@@ -228,7 +232,7 @@ Result<> watchServices() {
     try {
         theWatch().watch = std::make_unique<ServiceWatch>();
     } catch (const std::system_error& error) {
-        return Error(ErrorNumber::daemon, std::string("Cannot start a thread: ") + error.what() + ".");
+        return Error(ErrorNumber::daemon, std::string("Cannot watch the services: ") + error.what() + ".");
     }
     return {};
 }
