@@ -100,7 +100,7 @@ void makeFirstState(const std::filesystem::path& place) {
     check(replaceFile("etc/velt/network.conf",
                       "# A trial: nobody else can connect.\nversion = 1\nloopback_only = 1\n", 0644));
     // Written last, the shares show that all of the demo is there. They may have become the user's own since.
-    if (!fileExists(sharesFile)) {
+    if (!valueOf(isThere(sharesFile))) {
         makeDemoShare(place);
     }
     makeSettings();

@@ -77,7 +77,8 @@ std::string SystemdLauncher::reasonOfFailure() const {
 }
 
 Result<> SystemdLauncher::retire() {
-    if (!fileExists(places_.units / unit_)) {
+    VELT_ASSIGN_OR_RETURN(const bool hasUnit, isThere(places_.units / unit_));
+    if (!hasUnit) {
         return {};
     }
     const auto stopped = runProcess({places_.systemctl, "stop", unit_});

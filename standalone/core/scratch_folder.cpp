@@ -65,9 +65,10 @@ void sweepScratchFolders() {
     }
     std::error_code error;
     std::vector<std::filesystem::path> abandoned;
-    for (const auto& entry : std::filesystem::directory_iterator(statePath(paths::run), error)) {
-        if (entry.path().filename().string().starts_with(prefix) && lockedFolder(entry.path())) {
-            abandoned.push_back(entry.path());
+    for (std::filesystem::directory_iterator entry(statePath(paths::run), error), end; !error && entry != end;
+         entry.increment(error)) {
+        if (entry->path().filename().string().starts_with(prefix) && lockedFolder(entry->path())) {
+            abandoned.push_back(entry->path());
         }
     }
     for (const auto& folder : abandoned) {
