@@ -107,7 +107,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
         log.write("some enabled services did not start: " + started.error().message);
     }
     if (const auto watched = velt::watchServices(); !watched) {
-        log.write("cannot watch the services: " + watched.error().message);
+        log.write(watched.error().message);
     }
     server.start(config.ioThreads);
     if (config.printReady) {
@@ -121,6 +121,12 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     app.stop();
     velt::unwatchServices();
     log.write("stopped");
+}
+
+/// Of what other libraries throw it makes one.
+std::string sentenceOf(const std::exception& error) {
+    const std::string text = error.what();
+    return text.ends_with('.') ? text : "Cannot start: " + text + ".";
 }
 
 } // namespace
@@ -152,7 +158,7 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "veltd: %s\n", error.what());
         return usageError;
     } catch (const std::exception& error) {
-        std::fprintf(stderr, "veltd: %s\n", error.what());
+        std::fprintf(stderr, "veltd: %s\n", sentenceOf(error).c_str());
         return 1;
     }
 }

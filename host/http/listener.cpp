@@ -122,9 +122,18 @@ sockaddr_un unixAddress(const std::filesystem::path& path) {
     return address;
 }
 
+/// Throws where there is none to be had. `place` is where it is to listen.
+int openSocket(int family, const std::string& place) {
+    const int descriptor = socket(family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    if (descriptor < 0) {
+        throw ListenError(cannot("listen on", place).message);
+    }
+    return descriptor;
+}
+
 /// Whether a process accepts connections there.
-bool answers(const sockaddr_un& address) {
-    const UniqueFd caller(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+bool answers(const sockaddr_un& address, const std::string& path) {
+    const UniqueFd caller(openSocket(AF_UNIX, path));
     return connect(caller.get(), generic(&address), sizeof address) == 0 || errno == EAGAIN;
 }
 
@@ -136,7 +145,7 @@ void removeStale(const std::filesystem::path& path, const sockaddr_un& address) 
     if (!S_ISSOCK(status.st_mode)) {
         throw ListenError(path.string() + " exists and is not a socket.");
     }
-    if (answers(address)) {
+    if (answers(address, path)) {
         throw ListenError("Another program already listens on " + path.string() + ".");
     }
     unlink(path.c_str());
@@ -179,8 +188,8 @@ void readCredentials(int descriptor, Peer& peer) {
 
 } // namespace
 
-Listener::Listener(int descriptor)
-    : descriptor_(descriptor), isUnixSocket_(familyOf(descriptor) == AF_UNIX) {}
+Listener::Listener(int descriptor, bool isUnixSocket)
+    : descriptor_(descriptor), isUnixSocket_(isUnixSocket) {}
 
 Listener::~Listener() {
     if (descriptor_ && !path_.empty()) {
@@ -199,7 +208,7 @@ Listener Listener::tcp(const std::string& address, bool allowRemote) {
     }
     const std::unique_ptr<addrinfo, decltype(&freeaddrinfo)> owner(list, freeaddrinfo);
     checkReach(address, list->ai_addr, list->ai_addrlen, allowRemote);
-    Listener listener(socket(list->ai_family, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+    Listener listener(openSocket(list->ai_family, address), false);
     const int on = 1;
     setsockopt(listener.descriptor(), SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
     if (bind(listener.descriptor(), list->ai_addr, list->ai_addrlen) != 0 ||
@@ -214,7 +223,7 @@ Listener Listener::unixSocket(const std::filesystem::path& path, const std::stri
     std::filesystem::create_directories(path.parent_path(), error);
     const sockaddr_un address = unixAddress(path);
     removeStale(path, address);
-    Listener listener(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0));
+    Listener listener(openSocket(AF_UNIX, path), true);
     // With the right mode from the start, nobody can connect too early.
     const mode_t former = umask(0117);
     const int bound = bind(listener.descriptor(), generic(&address), sizeof address);
@@ -247,7 +256,7 @@ std::vector<Listener> Listener::inherited(bool allowRemote) {
         }
         fcntl(descriptor, F_SETFD, FD_CLOEXEC);
         fcntl(descriptor, F_SETFL, fcntl(descriptor, F_GETFL) | O_NONBLOCK);
-        listeners.push_back(Listener(descriptor));
+        listeners.push_back(Listener(descriptor, familyOf(descriptor) == AF_UNIX));
         if (!listeners.back().isUnixSocket()) {
             const SocketName name = socketName(descriptor, getsockname);
             checkReach(listeners.back().name(), generic(&name.address), name.size, allowRemote);

@@ -46,7 +46,7 @@ public:
     unsigned short port() const; ///< 0 for a Unix socket
 
 private:
-    explicit Listener(int descriptor);
+    Listener(int descriptor, bool isUnixSocket);
 
     UniqueFd descriptor_;
     bool isUnixSocket_;
