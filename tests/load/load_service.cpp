@@ -1,13 +1,12 @@
 #include "tests/load/load_service.h"
 
 #include "base/number_text.h"
+#include "tests/load/stand_in_daemons.h"
 
-#include <sys/mount.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
@@ -20,8 +19,6 @@ namespace velt::test {
 namespace fs = std::filesystem;
 
 namespace {
-
-constexpr std::array daemons{"/usr/sbin/proftpd", "/usr/sbin/sshd"};
 
 /// Of this world, but for the test itself.
 std::vector<pid_t> processes() {
@@ -69,11 +66,7 @@ void LoadService::SetUp() {
     if (!whyNoWorld().empty()) {
         GTEST_SKIP() << whyNoWorld();
     }
-    // Once for the world, which each program of tests has for itself.
-    static const bool mounted = std::ranges::all_of(daemons, [](const char* daemon) {
-        return mount(VELT_STAND_IN_DAEMON, daemon, nullptr, MS_BIND, nullptr) == 0;
-    });
-    ASSERT_TRUE(mounted) << std::strerror(errno);
+    ASSERT_TRUE(mountStandInDaemons()) << std::strerror(errno);
     HostService::SetUp();
     if (HasFatalFailure()) {
         return;
