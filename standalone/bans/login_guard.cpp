@@ -150,14 +150,11 @@ Result<bool> liftBan(const std::string& addressOrSource) {
     return true;
 }
 
-std::vector<BannedSource> sourcesToRefuse() {
+Result<std::vector<BannedSource>> sourcesToRefuse() {
     const auto now = Clock::now();
-    const auto bans = bansAt(now);
-    if (!bans) {
-        complain(bans.error());
-    }
+    VELT_ASSIGN_OR_RETURN(const auto bans, bansAt(now));
     std::vector<BannedSource> sources;
-    for (const Ban& each : bans.valueOr({})) {
+    for (const Ban& each : bans) {
         sources.push_back({each.source, std::chrono::floor<std::chrono::seconds>(each.until - now)});
     }
     return sources;

@@ -38,7 +38,7 @@ std::optional<Ban> currentBanOf(const std::string& address);
 Result<bool> liftBan(const std::string& addressOrSource);
 
 /// All who are banned, for the rules of the firewall.
-std::vector<BannedSource> sourcesToRefuse();
+Result<std::vector<BannedSource>> sourcesToRefuse();
 
 } // namespace velt
 

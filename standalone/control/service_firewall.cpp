@@ -24,7 +24,7 @@ Result<FirewallNeeds> firewallNeeds() {
             }
         }
     }
-    needs.banned = sourcesToRefuse();
+    VELT_ASSIGN_OR_RETURN(needs.banned, sourcesToRefuse());
     needs.administration = administrationPorts;
     return needs;
 }

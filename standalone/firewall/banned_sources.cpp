@@ -3,7 +3,6 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/rule_script.h"
-#include "standalone/firewall/ruleset_generation.h"
 
 #include <algorithm>
 
@@ -23,15 +22,20 @@ std::string renderTimed(const BannedSource& source) {
     return renderElement(source.source, " timeout " + std::to_string(left) + "s");
 }
 
+/// Under the StateLock.
+Result<bool> hasRules() {
+    VELT_ASSIGN_OR_RETURN(const bool allowed, mayTouchRules());
+    return allowed ? rulesWereLoaded() : false;
+}
+
 Result<bool> change(const std::string& script) {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    if (!mayTouchRules() || !rulesWereLoaded()) {
-        return false;
+    VELT_ASSIGN_OR_RETURN(const bool loaded, hasRules());
+    if (loaded) {
+        VELT_ASSIGN_OR_RETURN(const auto before, runRuleScript(script));
+        noteChanged(before);
     }
-    const auto before = rulesetGeneration();
-    VELT_RETURN_IF_ERROR(runRuleScript(script));
-    noteChanged(before);
-    return true;
+    return loaded;
 }
 
 } // namespace
@@ -56,7 +60,7 @@ Result<bool> admitSource(const IpNetwork& source) {
 
 Result<bool> firewallRefuses() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-    return mayTouchRules() && rulesWereLoaded();
+    return hasRules();
 }
 
 } // namespace velt

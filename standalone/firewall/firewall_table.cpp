@@ -10,7 +10,6 @@
 #include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/rule_script.h"
 #include "standalone/firewall/ruleset.h"
-#include "standalone/firewall/ruleset_generation.h"
 #include "standalone/process/run_program.h"
 
 #include <syslog.h>
@@ -54,7 +53,8 @@ void warnOfForeignTables() {
 }
 
 Result<> removeRules(const std::string& script) {
-    VELT_RETURN_IF_ERROR(runRuleScript(script));
+    VELT_ASSIGN_OR_RETURN(const auto before, runRuleScript(script));
+    (void)before; // there is nothing left to which it would belong
     noteRemoved();
     ::unlink(warningFile().c_str());
     return {};
@@ -92,9 +92,8 @@ Result<> replaceRules(const FirewallSettings& firewall, const std::string& scrip
     VELT_RETURN_IF_ERROR(checkAdministration(firewall, needs));
     // Noted before it is done, since a note without rules does no harm.
     VELT_RETURN_IF_ERROR(noteLoading());
-    const auto before = rulesetGeneration();
     // Those who are banned are no part of what is compared: they come and go with the rules in force.
-    VELT_RETURN_IF_ERROR(runRuleScript(script + renderBannedSources(needs.banned)));
+    VELT_ASSIGN_OR_RETURN(const auto before, runRuleScript(script + renderBannedSources(needs.banned)));
     noteLoaded(script, before);
     warnOfForeignTables();
     return {};
@@ -115,7 +114,8 @@ std::optional<AdministrationPort> firstClosed(const std::vector<AdministrationPo
 }
 
 Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds) {
-    if (!mayTouchRules()) {
+    VELT_ASSIGN_OR_RETURN(const bool allowed, mayTouchRules());
+    if (!allowed) {
         return {};
     }
     // Held until the rules are loaded: of two processes the one with the older settings must not load its
@@ -123,7 +123,8 @@ Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeed
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     VELT_ASSIGN_OR_RETURN(const auto firewall, loadFirewallSettings());
     const bool off = firewall.mode == FirewallMode::off;
-    if (off && !rulesWereLoaded()) {
+    VELT_ASSIGN_OR_RETURN(const bool loaded, rulesWereLoaded());
+    if (off && !loaded) {
         return {}; // nothing to take away, and perhaps no right to do it
     }
     VELT_ASSIGN_OR_RETURN(const auto needs, askNeeds());

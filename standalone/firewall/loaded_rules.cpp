@@ -33,8 +33,8 @@ std::string note(std::uint32_t generation, std::string_view script) {
 
 } // namespace
 
-bool rulesWereLoaded() {
-    const auto text = readFile(noteFile());
+Result<bool> rulesWereLoaded() {
+    VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(noteFile()));
     return text && text->substr(0, text->find('\n')) == bootId();
 }
 

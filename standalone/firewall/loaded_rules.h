@@ -13,7 +13,7 @@ namespace velt {
 
 /// Whether rules of ours were loaded, or were about to be, since the machine started. (Below a state root
 /// other than "/" the note outlives a boot, the rules do not.)
-bool rulesWereLoaded();
+Result<bool> rulesWereLoaded();
 
 /// Whether the rules that this script loads are in force: it was the last that we loaded here, and nobody has
 /// changed any rule of this network since.

@@ -6,6 +6,7 @@
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
+#include "standalone/firewall/ruleset_generation.h"
 #include "standalone/process/last_words.h"
 #include "standalone/process/run_program.h"
 
@@ -15,16 +16,23 @@ namespace {
 
 constexpr std::size_t longestReason = 400;
 
-} // namespace
-
-bool mayTouchRules() {
-    return statePath("/") == "/" || fileExists(statePath(paths::firewallSettings));
+Error cannotLoad(const std::string& reason) {
+    return {ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + "."};
 }
 
-Result<> runRuleScript(const std::string& script) {
+} // namespace
+
+Result<bool> mayTouchRules() {
+    return statePath("/") == "/" ? Result<bool>(true) : isThere(statePath(paths::firewallSettings));
+}
+
+Result<std::optional<std::uint32_t>> runRuleScript(const std::string& script) {
+    auto before = rulesetGeneration();
     const auto result = runProcess({"nft", "-f", "-"}, script);
     if (result && result->exitCode == 0) {
-        return {};
+        // It takes a script that it cannot read for one that says nothing.
+        const bool idle = before && rulesetGeneration() == before;
+        return idle ? Result<std::optional<std::uint32_t>>(cannotLoad("nft has changed nothing")) : before;
     }
     const std::string errors = result ? result->errors : result.error().message;
     // It may be a sentence of its own.
@@ -33,7 +41,7 @@ Result<> runRuleScript(const std::string& script) {
     if (reason.find("Operation not permitted") != std::string::npos) {
         reason = "this process is not allowed to change the firewall";
     }
-    return Error(ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + ".");
+    return cannotLoad(reason);
 }
 
 } // namespace velt

@@ -4,16 +4,19 @@
 
 #include "base/result.h"
 
+#include <cstdint>
+#include <optional>
 #include <string>
 
 namespace velt {
 
 /// The rules belong to the machine, so an installation below another root leaves them alone unless it was
 /// told about a firewall: its defaults would take away what the machine's own installation drops.
-bool mayTouchRules();
+Result<bool> mayTouchRules();
 
-/// Carries the script out, as a whole or not at all.
-Result<> runRuleScript(const std::string& script);
+/// Carries the script out, as a whole or not at all. It has to change something. Returns the generation of
+/// the rules before; nothing where it cannot be told.
+Result<std::optional<std::uint32_t>> runRuleScript(const std::string& script);
 
 } // namespace velt
 

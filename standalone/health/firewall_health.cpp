@@ -122,7 +122,7 @@ Findings findingsInForce(const FirewallSettings& settings, const FirewallNeeds& 
 } // namespace
 
 Findings firewallFindings() {
-    if (!mayTouchRules()) {
+    if (!mayTouchRules().valueOr(true)) {
         return {};
     }
     const auto settings = loadFirewallSettings();

@@ -131,9 +131,11 @@ TEST_F(LoginGuard, HandsTheFirewallWhatIsLeftOfEachBan) {
     set("failures = 1\nban_seconds = 60");
     fail("192.0.2.7", 1);
     const auto sources = sourcesToRefuse();
-    ASSERT_EQ(sources.size(), 1U);
-    EXPECT_EQ(toText(sources[0].source), "192.0.2.7");
-    EXPECT_TRUE(sources[0].left > std::chrono::seconds(50) && sources[0].left <= std::chrono::seconds(60));
+    ASSERT_TRUE(sources);
+    ASSERT_EQ(sources->size(), 1U);
+    const BannedSource& first = sources->front();
+    EXPECT_EQ(toText(first.source), "192.0.2.7");
+    EXPECT_TRUE(first.left > std::chrono::seconds(50) && first.left <= std::chrono::seconds(60));
     const auto current = currentBans();
     ASSERT_TRUE(current);
     EXPECT_FALSE(current->firewall) << "below this root no rule is touched";
