@@ -7,6 +7,7 @@
 #include "tests/support/fault_sweep.h"
 #include "tests/support/result.h"
 #include "tests/support/temporary_folder.h"
+#include "tests/support/text.h"
 
 #include <gtest/gtest.h>
 
@@ -18,22 +19,12 @@
 
 #include <algorithm>
 #include <set>
-#include <sstream>
 
 namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
 
 using Lines = std::set<std::string>;
-
-Lines linesOf(const std::string& text) {
-    Lines lines;
-    std::istringstream stream(text);
-    for (std::string line; std::getline(stream, line);) {
-        lines.insert(line);
-    }
-    return lines;
-}
 
 struct ViewCase {
     const char* name;
