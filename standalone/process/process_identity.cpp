@@ -23,6 +23,7 @@ namespace {
 struct ProcessStat {
     char state = 0;
     pid_t parent = 0;
+    long threads = 0;
     unsigned long long startTime = 0;
 };
 
@@ -40,12 +41,12 @@ std::optional<ProcessStat> parseStat(const std::string& line) {
     std::istringstream fields(line.substr(nameEnd + 1));
     ProcessStat stat;
     fields >> stat.state >> stat.parent;
-    constexpr int fieldsBetweenParentAndStart = 17;
+    constexpr int fieldsBetweenParentAndThreads = 15;
     std::string skipped;
-    for (int field = 0; field < fieldsBetweenParentAndStart; ++field) {
+    for (int field = 0; field < fieldsBetweenParentAndThreads; ++field) {
         fields >> skipped;
     }
-    fields >> stat.startTime;
+    fields >> stat.threads >> skipped >> stat.startTime;
     if (!fields) {
         return std::nullopt;
     }
@@ -62,8 +63,10 @@ StatReading readStat(pid_t pid) {
     return {parseStat(std::string(line.data(), static_cast<std::size_t>(length)))};
 }
 
+/// A process whose first thread has ended looks like one that has ended, but keeps its files, and its ports,
+/// until the last of its threads has.
 bool hasEnded(const ProcessStat& stat) {
-    return stat.state == 'Z' || stat.state == 'X';
+    return stat.state == 'X' || (stat.state == 'Z' && stat.threads <= 1);
 }
 
 struct Relation {

@@ -15,7 +15,7 @@ using std::chrono::milliseconds;
 // A client that has begun to connect answers within its distance, or asks again after a second.
 constexpr milliseconds shortest{1500};
 constexpr milliseconds longest{10000};
-constexpr milliseconds hurry{100}; ///< for what waits already, if it must end now
+constexpr milliseconds hurry{1000}; ///< for what waits already, which never grows, if it must end now
 constexpr milliseconds look{20};
 
 } // namespace
