@@ -50,7 +50,7 @@ bool isInTheWay(const Daemon& daemon, const Daemon& other) {
 
 ProgramStep storeStep(const StagedFile& file) {
     const std::string subject = subjectOf(file);
-    return {{StepKind::store, subject}, [file, subject]() -> Result<int> {
+    return {ChangeStep{StepKind::store, subject}, [file, subject]() -> Result<int> {
                 VELT_RETURN_IF_ERROR(perform(Effect::store, subject, [&] { return store(file); }));
                 return 0;
             }};
@@ -82,9 +82,28 @@ Result<int> actOn(const Daemon& daemon, Effect effect, SessionPolicy policy, Res
 }
 
 ProgramStep stopStep(const Daemon& daemon) {
-    return {{StepKind::stop, std::string(daemon.apiName)},
+    return {ChangeStep{StepKind::stop, std::string(daemon.apiName)},
             [&daemon] { return actOn(daemon, Effect::stop, SessionPolicy::end, stopDaemon); },
             sessionsOf(daemon)};
+}
+
+/// Whether the daemon runs with the configuration that a start would give it.
+bool runsAsWanted(const Daemon& daemon) {
+    const DaemonState state = daemonState(daemon);
+    const auto hash = daemon.test();
+    return hash && isAlive(state.supervisor) && state.configurationHash == *hash;
+}
+
+/// What a start does, seen from outside.
+std::optional<ChangeStep> startKind(const Daemon& daemon, bool serves, bool endsSessions) {
+    const std::string name(daemon.apiName);
+    if (!serves) {
+        return ChangeStep{StepKind::start, name};
+    }
+    if (!runsAsWanted(daemon)) {
+        return ChangeStep{StepKind::handOver, name};
+    }
+    return endsSessions ? std::optional(ChangeStep{StepKind::endSessions, name}) : std::nullopt;
 }
 
 /// A start, in which the daemon's sessions end if the policy, or what the change takes from them, wants it.
@@ -93,14 +112,14 @@ ProgramStep startStep(const Daemon& daemon, bool serves, const StagedRequest& re
     const bool ends =
         request.policy == SessionPolicy::end || (request.policy == SessionPolicy::byChange && takesRights);
     const SessionPolicy policy = ends ? SessionPolicy::end : request.policy;
-    return {{serves ? StepKind::handOver : StepKind::start, std::string(daemon.apiName)},
+    return {startKind(daemon, serves, ends),
             [&daemon, policy] { return actOn(daemon, Effect::start, policy, startDaemon); },
             ends ? sessionsOf(daemon) : 0};
 }
 
 /// Outside a request, in which it would wait.
 ProgramStep pauseStep(const Daemon& daemon) {
-    return {{StepKind::pause, std::string(daemon.apiName)}, [&daemon]() -> Result<int> {
+    return {ChangeStep{StepKind::pause, std::string(daemon.apiName)}, [&daemon]() -> Result<int> {
                 VELT_RETURN_IF_ERROR(
                     perform(Effect::stop, daemon.name, [&daemon] { return pauseDaemon(daemon); }));
                 return 0;
@@ -109,7 +128,7 @@ ProgramStep pauseStep(const Daemon& daemon) {
 
 /// Of a daemon that has nothing else to follow.
 ProgramStep endSessionsStep(const Daemon& daemon) {
-    return {{StepKind::endSessions, std::string(daemon.apiName)},
+    return {ChangeStep{StepKind::endSessions, std::string(daemon.apiName)},
             [&daemon] { return actOn(daemon, Effect::start, SessionPolicy::end, startDaemon); },
             sessionsOf(daemon)};
 }
@@ -157,13 +176,13 @@ void addPortSteps(StepKind kind, const OpenPorts& ports, const OpenPorts& others
     for (const VELT_FTP_PORT_RANGE& range : ports) {
         const std::string text = textOf(range);
         if (std::ranges::find(others, text, textOf) == others.end()) {
-            program.push_back({{kind, text}, {}});
+            program.push_back({ChangeStep{kind, text}, {}});
         }
     }
 }
 
 ProgramStep journalStep(const LogEntry& entry) {
-    return {{StepKind::logEntry, entry.sentence}, {}};
+    return {ChangeStep{StepKind::logEntry, entry.sentence}, {}};
 }
 
 ProgramStep journalStep(const SystemEvent& event) {
@@ -172,7 +191,7 @@ ProgramStep journalStep(const SystemEvent& event) {
         // "ftpd stop": by name, the action comes first.
         subject.insert(0, subject.empty() ? "" : " ").insert(0, value);
     }
-    return {{StepKind::event, subject}, {}};
+    return {ChangeStep{StepKind::event, subject}, {}};
 }
 
 } // namespace
@@ -183,7 +202,7 @@ std::vector<ProgramStep> programOf(const StagedRequest& request) {
         program.push_back(storeStep(file));
     }
     for (const std::string& keys : request.missingKeys) {
-        program.push_back({{StepKind::store, keys}, {}}); // its daemon's start makes it
+        program.push_back({ChangeStep{StepKind::store, keys}, {}}); // its daemon's start makes it
     }
     addDaemonSteps(request, program);
     const bool concerned =

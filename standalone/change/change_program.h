@@ -9,6 +9,7 @@
 #include "standalone/journal/held_journal.h"
 
 #include <functional>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -32,7 +33,7 @@ struct StagedRequest {
 
 /// A step, and how it is done.
 struct ProgramStep {
-    ChangeStep step;
+    std::optional<ChangeStep> step; ///< none where nothing is to be seen of it
     std::function<Result<int>()>
         act{};             ///< gives the sessions that it ended; empty: it comes with another step
     int sessionsEnded = 0; ///< as it looks now

@@ -71,11 +71,13 @@ ChangeOutcome failed(const StagedRequest& request, const FormerStates& former, E
 Result<> doSteps(const std::vector<ProgramStep>& program, std::optional<StateLock> lock,
                  ChangeOutcome& outcome) {
     for (const ProgramStep& each : program) {
-        if (each.step.kind != StepKind::store) {
+        if (!each.step || each.step->kind != StepKind::store) {
             lock.reset();
         }
         VELT_ASSIGN_OR_RETURN(const int ended, each.act ? each.act() : Result<int>(0));
-        outcome.steps.push_back(each.step);
+        if (each.step) {
+            outcome.steps.push_back(*each.step);
+        }
         outcome.sessionsEnded += ended;
     }
     return {};

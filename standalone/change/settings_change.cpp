@@ -54,7 +54,9 @@ public:
         VELT_ASSIGN_OR_RETURN(const auto request, collect(policy));
         ChangeOutcome outcome;
         for (const ProgramStep& each : programOf(request)) {
-            outcome.steps.push_back(each.step);
+            if (each.step) {
+                outcome.steps.push_back(*each.step);
+            }
             outcome.sessionsEnded += each.sessionsEnded;
         }
         return outcome;

@@ -17,13 +17,19 @@ namespace {
 // the service is off, or is being switched off, settings can be changed without these; switching it on tests
 // them all.
 Result<> check(const FtpSettings& settings) {
-    const Result<> checked = checkFtpSettings(settings);
-    return checked && enablesFtp(settings.record) ? testFtpCandidate(settings) : checked;
+    VELT_RETURN_IF_ERROR(checkFtpSettings(settings));
+    if (enablesFtp(settings.record)) {
+        VELT_ASSIGN_OR_RETURN([[maybe_unused]] const auto hash, testFtpCandidate(settings));
+    }
+    return {};
 }
 
 Result<> check(const SftpSettings& settings) {
-    const Result<> checked = checkSftpSettings(settings);
-    return checked && settings.enabled ? testSftpCandidate(settings) : checked;
+    VELT_RETURN_IF_ERROR(checkSftpSettings(settings));
+    if (settings.enabled) {
+        VELT_ASSIGN_OR_RETURN([[maybe_unused]] const auto hash, testSftpCandidate(settings));
+    }
+    return {};
 }
 
 template<class Settings>

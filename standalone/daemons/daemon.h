@@ -84,8 +84,10 @@ struct Daemon {
     /// other would not let it; true also when that cannot be told. Folders are those of plans.
     bool (*takesRights)(const std::filesystem::path& former, const std::filesystem::path& next);
 
-    /// Puts the stored settings to the daemon's own test. Nothing that a running daemon uses is touched.
-    Result<> (*test)();
+    /// Puts the stored settings to the daemon's own test, and returns the hash of the configuration that a
+    /// plan of them would have. Nothing that a running daemon uses is touched. Where a start would first make
+    /// keys or a certificate, the hash is one that no plan has.
+    Result<std::string> (*test)();
 };
 
 extern const Daemon ftpDaemon;  ///< one process for FTP and FTPS

@@ -27,7 +27,7 @@ Result<DaemonSettings> loadSettings() {
          {passive, true, "the passive range " + formatPortRange(passive) + " of the FTP service"}}};
 }
 
-Result<> testStored() {
+Result<std::string> testStored() {
     VELT_ASSIGN_OR_RETURN(const auto stored, loadFtpSettings());
     return testFtpCandidate(stored);
 }

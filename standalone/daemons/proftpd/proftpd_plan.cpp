@@ -61,13 +61,16 @@ std::string hashOf(const FtpSettings& settings, const FtpSurroundings& found) {
     return sha256(all);
 }
 
-Result<> testRendering(const FtpSettings& settings, const FtpSurroundings& found) {
+/// Returns the rendering's hash.
+Result<std::string> testRendering(const FtpSettings& settings, const FtpSurroundings& found) {
+    std::string hash = hashOf(settings, found);
     std::vector<std::filesystem::path> accounts; // which the daemon reads at each login, and its test now
     if (const auto& files = found.places.accountFiles) {
         accounts = {files->users, files->groups};
     }
-    return testOnce(hashOf(settings, found) + identityOf(accounts),
-                    [&] { return runTest(settings, found.places); });
+    VELT_RETURN_IF_ERROR(
+        testOnce(hash + identityOf(accounts), [&] { return runTest(settings, found.places); }));
+    return hash;
 }
 
 Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& places) {
@@ -81,8 +84,7 @@ Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& pla
                : Result<>();
 }
 
-Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found) {
-    const std::string hash = hashOf(settings, found);
+Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found, const std::string& hash) {
     const auto folder = found.places.runFolder / "configurations" / hash;
     found.places.anonymousShare = folder / "anonymous";
     VELT_RETURN_IF_ERROR(writeSurroundings(settings, found.places));
@@ -97,7 +99,7 @@ Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found)
 
 } // namespace
 
-Result<> testFtpCandidate(const FtpSettings& settings) {
+Result<std::string> testFtpCandidate(const FtpSettings& settings) {
     VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
     return testRendering(settings, found);
 }
@@ -110,8 +112,8 @@ Result<std::optional<DaemonPlan>> planFtpDaemon() {
     }
     VELT_RETURN_IF_ERROR(checkFtpSettings(settings));
     VELT_ASSIGN_OR_RETURN(const auto found, surveyFtp(settings));
-    VELT_RETURN_IF_ERROR(testRendering(settings, found));
-    VELT_ASSIGN_OR_RETURN(auto plan, writePlan(settings, found));
+    VELT_ASSIGN_OR_RETURN(const auto hash, testRendering(settings, found));
+    VELT_ASSIGN_OR_RETURN(auto plan, writePlan(settings, found, hash));
     return plan;
 }
 

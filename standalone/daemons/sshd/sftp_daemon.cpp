@@ -20,7 +20,7 @@ Result<DaemonSettings> loadSettings() {
                           {{{stored.port, stored.port}, false, "the SFTP service"}}};
 }
 
-Result<> testStored() {
+Result<std::string> testStored() {
     VELT_ASSIGN_OR_RETURN(const auto stored, loadSftpSettings());
     return testSftpCandidate(stored);
 }

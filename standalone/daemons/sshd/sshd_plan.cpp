@@ -81,13 +81,16 @@ std::string hashOf(const Rendering& rendering) {
     return sha256(rendering.text + '\0' + identityOf(files));
 }
 
-Result<> testRendering(const Rendering& rendering) {
-    return testOnce(hashOf(rendering), [&] { return runTest(rendering.text); });
+/// Returns the rendering's hash.
+Result<std::string> testRendering(const Rendering& rendering) {
+    std::string hash = hashOf(rendering);
+    VELT_RETURN_IF_ERROR(testOnce(hash, [&] { return runTest(rendering.text); }));
+    return hash;
 }
 
 } // namespace
 
-Result<> testSftpCandidate(const SftpSettings& settings) {
+Result<std::string> testSftpCandidate(const SftpSettings& settings) {
     VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
     return testRendering(rendering);
 }
@@ -97,8 +100,7 @@ Result<std::optional<DaemonPlan>> planSftpDaemon() {
     VELT_ASSIGN_OR_RETURN(const auto settings, loadSftpSettings());
     VELT_RETURN_IF_ERROR(checkSftpSettings(settings));
     VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
-    VELT_RETURN_IF_ERROR(testRendering(rendering));
-    const std::string hash = hashOf(rendering);
+    VELT_ASSIGN_OR_RETURN(const auto hash, testRendering(rendering));
     const auto folder = statePath(paths::sftpConfigurations) / hash;
     const auto configuration = folder / "sshd_config";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, rendering.text, 0600));

@@ -7,12 +7,13 @@
 #include "standalone/settings/settings.h"
 
 #include <optional>
+#include <string>
 
 namespace velt {
 
-/// Puts the configuration that would follow from these settings to the daemon's own test. Nothing that a
-/// running daemon uses is touched.
-Result<> testSftpCandidate(const SftpSettings& settings);
+/// Puts the configuration that would follow from these settings to the daemon's own test, and returns its
+/// hash, see Daemon::test. Nothing that a running daemon uses is touched.
+Result<std::string> testSftpCandidate(const SftpSettings& settings);
 
 /// The plan that follows from the stored settings, see Daemon::plan: always one, since SFTP may be started by
 /// name while its setting is off.

@@ -106,6 +106,26 @@ TEST_F(SettingsChangeTest, ACommitDoesWhatThePlanSaid) {
     EXPECT_FALSE(fileExists(statePath(paths::unfinishedChange)));
 }
 
+TEST_F(SettingsChangeTest, ADaemonThatRunsAsWantedIsNotHandedOver) {
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    const ProcessId daemon = daemonOf("ftpd");
+    const std::string stored = "store run key of ftpd; ";
+    const std::string logged = "log The SFTP port was changed from 1 to 2.";
+    const std::pair<SessionPolicy, std::string> cases[]{{usual, ""},
+                                                        {SessionPolicy::end, "end sessions ftp; "}};
+    for (const auto& [policy, ends] : cases) {
+        const auto change = begin();
+        setRate(0);
+        const auto plan = change->plan(policy);
+        ASSERT_TRUE(plan);
+        EXPECT_EQ(textOf(plan->steps), (policy == usual ? stored : "") + ends + logged);
+        const auto outcome = change->commit(policy);
+        ASSERT_FALSE(outcome.failure) << outcome.failure->message;
+        EXPECT_EQ(textOf(outcome.steps), textOf(plan->steps));
+        EXPECT_EQ(daemonOf("ftpd"), daemon);
+    }
+}
+
 TEST_F(SettingsChangeTest, NothingAskedIsNothingDone) {
     const auto change = begin();
     const auto outcome = change->commit(usual);

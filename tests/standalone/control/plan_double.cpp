@@ -35,16 +35,45 @@ Result<> refuseIfAsked() {
     return {};
 }
 
-Result<std::optional<DaemonPlan>> makePlan(int port, const std::string& settings,
-                                           const std::vector<std::string>& options) {
-    if (const auto refused = refuseIfAsked(); !refused) {
-        return refused.error();
+/// What an order follows from.
+struct Rendering {
+    int port;
+    std::string settings;
+    std::vector<std::string> options;
+
+    std::string hash() const {
+        std::string text = settings;
+        for (const std::string& option : options) {
+            text += " " + option;
+        }
+        return text;
     }
-    std::string hash = settings;
-    for (const std::string& option : options) {
-        hash += " " + option;
+};
+
+Rendering render(const FtpSettings& settings) {
+    const auto& record = settings.record;
+    auto options = planDouble().ftpOptions;
+    if (record.maxuploadrate == planDouble().crashingRate) {
+        options.insert(options.end(), {"--refuse", "fatal: out of luck"});
     }
-    return std::optional(DaemonPlan{testOrder(port, hash, options), {}});
+    return {controlPort(record),
+            std::string(record.portnum) + " " + std::to_string(record.service_flags) + " " +
+                std::to_string(record.maxuploadrate),
+            options};
+}
+
+Rendering render(const SftpSettings& settings) {
+    return {settings.port, std::to_string(settings.port), planDouble().sftpOptions};
+}
+
+Result<std::string> testRendering(const Rendering& rendering) {
+    VELT_RETURN_IF_ERROR(refuseIfAsked());
+    return rendering.hash();
+}
+
+Result<std::optional<DaemonPlan>> makePlan(const Rendering& rendering) {
+    VELT_ASSIGN_OR_RETURN(const auto hash, testRendering(rendering));
+    return std::optional(DaemonPlan{testOrder(rendering.port, hash, rendering.options), {}});
 }
 
 } // namespace
@@ -54,42 +83,25 @@ namespace velt {
 
 Result<std::optional<DaemonPlan>> planFtpDaemon() {
     ++test::ftpPlansMade;
-    const auto settings = loadFtpSettings();
-    if (!settings) {
-        return settings.error();
-    }
-    const auto& record = settings->record;
-    if (!enablesFtp(record)) {
-        return std::optional<DaemonPlan>();
-    }
-    auto options = test::planDouble().ftpOptions;
-    if (record.maxuploadrate == test::planDouble().crashingRate) {
-        options.insert(options.end(), {"--refuse", "fatal: out of luck"});
-    }
-    return test::makePlan(controlPort(record),
-                          std::string(record.portnum) + " " + std::to_string(record.service_flags) + " " +
-                              std::to_string(record.maxuploadrate),
-                          options);
+    VELT_ASSIGN_OR_RETURN(const auto settings, loadFtpSettings());
+    return enablesFtp(settings.record) ? test::makePlan(test::render(settings)) : std::optional<DaemonPlan>();
 }
 
 Result<std::optional<DaemonPlan>> planSftpDaemon() {
-    const auto settings = loadSftpSettings();
-    if (!settings) {
-        return settings.error();
-    }
-    return test::makePlan(settings->port, std::to_string(settings->port), test::planDouble().sftpOptions);
+    VELT_ASSIGN_OR_RETURN(const auto settings, loadSftpSettings());
+    return test::makePlan(test::render(settings));
 }
 
 bool takesFtpRights(const std::filesystem::path&, const std::filesystem::path&) {
     return test::planDouble().takesRights;
 }
 
-Result<> testFtpCandidate(const FtpSettings&) {
-    return test::refuseIfAsked();
+Result<std::string> testFtpCandidate(const FtpSettings& settings) {
+    return test::testRendering(test::render(settings));
 }
 
-Result<> testSftpCandidate(const SftpSettings&) {
-    return test::refuseIfAsked();
+Result<std::string> testSftpCandidate(const SftpSettings& settings) {
+    return test::testRendering(test::render(settings));
 }
 
 } // namespace velt

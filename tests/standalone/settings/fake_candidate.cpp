@@ -8,9 +8,10 @@ namespace velt {
 
 namespace {
 
-Result<> answer() {
-    if (!test::fakeCandidate().refuses)
-        return {};
+Result<std::string> answer() {
+    if (!test::fakeCandidate().refuses) {
+        return std::string("hash");
+    }
     return Error(ErrorNumber::daemon, "The daemon does not take it.");
 }
 
@@ -21,12 +22,12 @@ test::FakeCandidate& test::fakeCandidate() {
     return candidate;
 }
 
-Result<> testFtpCandidate(const FtpSettings& settings) {
+Result<std::string> testFtpCandidate(const FtpSettings& settings) {
     test::fakeCandidate().ftp.push_back(settings);
     return answer();
 }
 
-Result<> testSftpCandidate(const SftpSettings& settings) {
+Result<std::string> testSftpCandidate(const SftpSettings& settings) {
     test::fakeCandidate().sftp.push_back(settings);
     return answer();
 }
