@@ -64,6 +64,16 @@ std::vector<FieldError> ignoredParts(const Json::Value& wanted, const Json::Valu
     return errors;
 }
 
+/// Nothing is staged for a change that is none.
+HttpResponse unchanged(const Json::Value& document, const ChangeOptions& options) {
+    ChangeReport report;
+    report.dryRun = options.dryRun;
+    report.down = servicesDown();
+    HttpResponse response = jsonResponse(200, toObject(report));
+    response.headers.emplace_back("ETag", tagOf(document));
+    return response;
+}
+
 } // namespace
 
 AllSettings::AllSettings(const ModuleTable& table, const OpenApi& openApi, Changes& changes)
@@ -110,25 +120,24 @@ HttpResponse AllSettings::change(const Call& call, bool isPatch) {
         return problem(500, before.error().message + nothing, call.id);
     }
     const Json::Value wanted = isPatch ? patched(*before, *body) : *body;
-    return store(wanted, "settings", std::get<ChangeOptions>(options), call);
+    return store(*before, wanted, "settings", std::get<ChangeOptions>(options), call);
 }
 
-HttpResponse AllSettings::store(const Json::Value& wanted, const std::string& way,
+HttpResponse AllSettings::store(const Json::Value& before, const Json::Value& wanted, const std::string& way,
                                 const ChangeOptions& options, const Call& call) {
-    const auto before = readSettingsDocument(table_, call.principal);
-    if (!before) {
-        return problem(500, before.error().message + nothing, call.id);
-    }
     // Writes run one at a time, so nothing can come between this check and the change.
-    if (!allows(call.request.ifMatch, *before)) {
+    if (!allows(call.request.ifMatch, before)) {
         return problem(412, std::string("The settings have changed since they were read.") + nothing,
                        call.id);
     }
-    if (const auto errors = checkSettings(wanted, *before); !errors.empty()) {
+    if (const auto errors = checkSettings(wanted, before); !errors.empty()) {
         return refused(errors, call.id);
     }
+    if (callsFor(before, wanted).empty()) {
+        return unchanged(before, options);
+    }
     const auto made =
-        changes_.make({way, call, options, portsIn(wanted)}, [&] { return ask(*before, wanted, call); });
+        changes_.make({way, call, options, portsIn(wanted)}, [&] { return ask(before, wanted, call); });
     if (const auto* const refusal = std::get_if<HttpResponse>(&made)) {
         return *refusal;
     }

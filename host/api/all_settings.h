@@ -23,9 +23,10 @@ public:
     /// It outlives its routes.
     std::vector<Route> routes();
 
-    /// Makes `wanted` what is stored, as a whole. `way` goes into the history.
-    HttpResponse store(const Json::Value& wanted, const std::string& way, const ChangeOptions& options,
-                       const Call& call);
+    /// Makes `wanted` what is stored, as a whole. `before` is what this request has read; `way` goes into the
+    /// history.
+    HttpResponse store(const Json::Value& before, const Json::Value& wanted, const std::string& way,
+                       const ChangeOptions& options, const Call& call);
 
 private:
     HttpResponse get(const Call& call) const;

@@ -203,7 +203,7 @@ HttpResponse History::undo(const Call& call) {
         return changedSince(conflicts, call);
     }
     HttpResponse response =
-        settings_.store(wanted, "undo " + call.path[2], std::get<ChangeOptions>(options), call);
+        settings_.store(*current, wanted, "undo " + call.path[2], std::get<ChangeOptions>(options), call);
     if (response.status == 200 && !std::get<ChangeOptions>(options).dryRun) {
         if (const auto noted = setChangeState(record->id, ChangeState::undone); !noted) {
             log_.write(call.id, noted.error().message);
@@ -240,7 +240,8 @@ bool History::takeBack(const ChangeRecord& change) {
     }
     const auto logged =
         logEvent(logCategory, logLevel, takenBackEvent, {id.c_str(), nullptr, nullptr, nullptr});
-    const HttpResponse response = settings_.store(undoing(change, *current).wanted, "undo " + id, {}, call);
+    const HttpResponse response =
+        settings_.store(*current, undoing(change, *current).wanted, "undo " + id, {}, call);
     if (response.status != 200) {
         log_.write(call.id, "cannot take back the unconfirmed change " + id + ": " + response.body);
         return false;
