@@ -192,7 +192,6 @@ int sweepFaults(const FaultSweep& sweep) {
         tried += runWith(fault, sweep) ? 1 : 0;
     }
     testing::Test::RecordProperty("faults", tried);
-    std::printf("FAULTS %d\n", tried);
     return tried;
 }
 

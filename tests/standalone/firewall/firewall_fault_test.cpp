@@ -109,10 +109,10 @@ protected:
         EXPECT_GE(sweepFaults(sweep), 20);
     }
 
-    static void bringBackBan(bool banned) {
+    static void bringBackBan(bool isBanned) {
         setMode(formerMode);
         ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
-        ASSERT_EQ(banned ? ban() : admit(), "done");
+        ASSERT_EQ(isBanned ? ban() : admit(), "done");
     }
 
     static std::string ban() {
