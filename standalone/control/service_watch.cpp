@@ -66,6 +66,7 @@ public:
         }
         for (const Incident& each : teller_.look(state, byUs, lostItsSupervisor(state))) {
             recordIncident(daemon_, each);
+            isBack_ = isBack_ || each.kind == Kind::started || each.kind == Kind::recovered;
         }
         operations_ = operations;
         if (mends) {
@@ -74,6 +75,8 @@ public:
     }
 
 private:
+    using Kind = Incident::Kind;
+
     /// A supervisor that is told to stop may end between the reading of its file and the look whether it
     /// lives; what it leaves says then that it was told to.
     DaemonState currentState() const {
@@ -82,11 +85,32 @@ private:
     }
 
     void mend(const DaemonState& state) {
+        if (isBack_ && holds() == 0) {
+            isBack_ = false;
+            updateReturned(state);
+        }
         if (restoresSupervisors_) {
             mendLost(state);
         }
         if (!retryAt_ && holds() == 0 && retry_.isDue(state)) {
             start([this] { return startDaemon(daemon_); });
+        }
+    }
+
+    /// Who brings a daemon back, such as systemd, gives it the configuration with which it ran; the settings,
+    /// or its certificate, may be others by now.
+    void updateReturned(const DaemonState& state) {
+        const auto settings = daemon_.settings();
+        if (!settings || !settings->enabled() || !isServing(state)) {
+            return;
+        }
+        const auto hash = daemon_.test();
+        if (!hash || *hash == state.configurationHash) {
+            return;
+        }
+        if (const auto done = perform(Effect::start, daemon_.name, [this] { return startDaemon(daemon_); });
+            !done) {
+            ::syslog(LOG_ERR, "%s", done.error().message.c_str());
         }
     }
 
@@ -131,6 +155,7 @@ private:
     IncidentTeller teller_;
     StartRetry retry_;
     bool restoresSupervisors_;
+    bool isBack_ = false; ///< by somebody else's doing, and not looked at since
     std::uint64_t operations_ = 0;
     std::string complaint_; ///< of the last start
     std::optional<Clock::time_point> retryAt_;

@@ -8,11 +8,11 @@ namespace velt {
 
 /// Looks after the daemons, on a thread of its own:
 /// - Twice a second, whether their supervisors live. What lost its supervisor is started again with the
-/// stored
-///   settings (ended, where these have switched it off): its sessions are cut. A supervisor brings back a
-///   daemon that dies; killed itself, it cannot, and its daemon's words go nowhere. Where systemd keeps the
-///   supervisors, it does this itself.
+///   stored settings (ended, where these have switched it off): its sessions are cut. A supervisor brings
+///   back a daemon that dies; killed itself, it cannot, and its daemon's words go nowhere. Where systemd
+///   keeps the supervisors, it does this itself.
 /// - A service that is switched on and whose start failed is tried again, see start_retry.h.
+/// - A daemon that came back with former settings, or a former certificate, is handed over to what is stored.
 /// - Daemons that die, come back, or are started and stopped by other programs get entries in the
 ///   administrator log and events.
 ///

@@ -233,6 +233,17 @@ TEST_F(ServiceWatchTest, NoEndIsMendedUntold) {
     unsubscribe(killer);
 }
 
+TEST_F(ServiceWatchTest, ADaemonThatCameBackFollowsTheStoredSettings) {
+    ASSERT_EQ(messageOf(watchServices()), "");
+    storeFtp(plain, 700);
+    std::this_thread::sleep_for(milliseconds(700));
+    EXPECT_FALSE(serviceState("ftpd").configurationHash.ends_with(" 700")) << "nobody has asked for it";
+    const ProcessId supervisor = serviceState("ftpd").supervisor;
+    signalProcess(daemonOf("ftpd"), SIGKILL);
+    EXPECT_TRUE(waitUntil([] { return serviceState("ftpd").configurationHash.ends_with(" 700"); }, patience));
+    EXPECT_EQ(serviceState("ftpd").supervisor, supervisor) << "a hand-over";
+}
+
 TEST_F(ServiceWatchTest, WhatAnotherProgramStopsAndStartsIsLogged) {
     Actions ftp("ftpd");
     ASSERT_EQ(messageOf(watchServices()), "");
