@@ -8,12 +8,12 @@
 #include "tests/support/result.h"
 #include "tests/support/waiting.h"
 #include "tests/system/support/clients.h"
+#include "tests/system/support/connect_loop.h"
 #include "tests/system/support/ftp_service.h"
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <atomic>
 #include <filesystem>
 #include <iterator>
 #include <set>
@@ -26,44 +26,6 @@ namespace {
 namespace fs = std::filesystem;
 using std::chrono::milliseconds;
 using std::chrono::seconds;
-
-/// What a client sees that does nothing but connect, and waits for the greeting.
-class ConnectLoop {
-public:
-    explicit ConnectLoop(int atPort) : thread_([this, atPort] { run(atPort); }) {}
-    ~ConnectLoop() { stop(); }
-    ConnectLoop(const ConnectLoop&) = delete;
-    ConnectLoop& operator=(const ConnectLoop&) = delete;
-
-    void stop() {
-        ended_ = true;
-        if (thread_.joinable()) {
-            thread_.join();
-        }
-    }
-
-    int greeted = 0;
-    int refused = 0; ///< no connection
-    int dropped = 0; ///< a connection without a greeting
-
-private:
-    void run(int atPort) {
-        while (!ended_) {
-            const UniqueFd connection = connectTo("127.0.0.1", atPort);
-            char first = 0;
-            if (!connection) {
-                ++refused;
-            } else if (::read(connection.get(), &first, 1) == 1) {
-                ++greeted;
-            } else {
-                ++dropped;
-            }
-        }
-    }
-
-    std::atomic<bool> ended_ = false;
-    std::thread thread_;
-};
 
 /// How many sessions the daemon's list has.
 int sessionsOfFtp() {
