@@ -12,9 +12,14 @@ constexpr unsigned unorderedThreads = 2;
 
 RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting, std::size_t maxWaitingBytes)
     : maxWaiting_(maxWaiting), maxWaitingBytes_(maxWaitingBytes) {
-    start(ordered_, threads);
-    start(unordered_, unorderedThreads);
-    start(searches_, 1);
+    try {
+        start(ordered_, threads);
+        start(unordered_, unorderedThreads);
+        start(searches_, 1);
+    } catch (...) {
+        stop(); // those that have started
+        throw;
+    }
 }
 
 RequestOrder::~RequestOrder() {

@@ -20,6 +20,14 @@ std::atomic<int>& waiting() {
     return count;
 }
 
+/// One of them, as long as it lives.
+struct WaitingMark {
+    WaitingMark() { ++waiting(); }
+    ~WaitingMark() { --waiting(); }
+    WaitingMark(const WaitingMark&) = delete;
+    WaitingMark& operator=(const WaitingMark&) = delete;
+};
+
 bool isOwnUser(const NamedAccount& account) {
     const auto users = parsePasswd(readFile(statePath(paths::ftpPasswd)).valueOr(""));
     return std::ranges::any_of(users, [&](const UserEntry& user) {
@@ -56,11 +64,11 @@ std::optional<std::vector<NamedAccount>> unknownAccounts(std::vector<NamedAccoun
     using Answer = std::vector<NamedAccount>;
     auto answer = std::make_shared<std::promise<Answer>>();
     auto future = answer->get_future();
-    ++waiting();
+    auto mark = std::make_shared<WaitingMark>();
     // A source that hangs cannot be interrupted, only left behind.
-    std::thread([answer, accounts = std::move(accounts)]() mutable {
+    std::thread([answer, mark = std::move(mark), accounts = std::move(accounts)]() mutable {
         std::erase_if(accounts, isKnown);
-        --waiting();
+        mark.reset();
         answer->set_value(std::move(accounts));
     }).detach();
     if (future.wait_for(limit) != std::future_status::ready) {

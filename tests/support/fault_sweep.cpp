@@ -129,7 +129,7 @@ std::vector<Fault> withFurtherErrors(const std::vector<Fault>& faults) {
     return all;
 }
 
-std::vector<Fault> chooseFaults(const std::vector<Fault>& all, bool briefly) {
+std::vector<Fault> chooseFaults(const std::vector<Fault>& all, Share share) {
     if (triesAll()) {
         return withFurtherErrors(all);
     }
@@ -139,7 +139,8 @@ std::vector<Fault> chooseFaults(const std::vector<Fault>& all, bool briefly) {
     }
     std::vector<Fault> chosen;
     std::ranges::copy_if(all, std::back_inserter(chosen), [&](const Fault& fault) {
-        return fault.occurrence == 0 || (!briefly && fault.occurrence == last[fault.label]);
+        const bool isLast = fault.occurrence == last[fault.label];
+        return share == Share::all || fault.occurrence == 0 || (share == Share::firstAndLast && isLast);
     });
     return chosen;
 }
@@ -188,7 +189,7 @@ bool isLoading(const SeenCall& call) {
 
 int sweepFaults(const FaultSweep& sweep) {
     int tried = 0;
-    for (const Fault& fault : chooseFaults(learnFaults(sweep), sweep.briefly)) {
+    for (const Fault& fault : chooseFaults(learnFaults(sweep), sweep.share)) {
         tried += runWith(fault, sweep) ? 1 : 0;
     }
     testing::Test::RecordProperty("faults", tried);

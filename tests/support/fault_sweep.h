@@ -17,6 +17,13 @@ struct SweptRun {
     ChildEnd end;
 };
 
+/// Which fail of the calls that differ in numbers alone.
+enum class Share {
+    first,
+    firstAndLast,
+    all,
+};
+
 struct FaultSweep {
     /// Before each run, in this process: brings what the run finds back to the same state.
     std::function<void()> prepare;
@@ -37,8 +44,7 @@ struct FaultSweep {
     /// started may still run; nothing of it must be left at the end.
     std::function<void(const SweptRun&)> check;
 
-    /// Of calls that differ in numbers alone, fails the first alone.
-    bool briefly = false;
+    Share share = Share::firstAndLast;
 
     std::chrono::milliseconds limit{10'000}; ///< for one run; the test fails past it
 };
@@ -49,9 +55,8 @@ void endFaults();
 /// Whether the call loads a program, its libraries, or what belongs to these.
 bool isLoading(const SeenCall& call);
 
-/// Does the operation once to learn its calls, and then once for each of them, which fails. Of calls that
-/// differ in numbers alone, the first and the last fail; with VELT_ALL_FAULTS in the environment, each does,
-/// and with several errors. Returns how many were tried.
+/// Does the operation once to learn its calls, and then once for each of its share of them, which fails. With
+/// VELT_ALL_FAULTS in the environment, all do, and with several errors. Returns how many were tried.
 int sweepFaults(const FaultSweep& sweep);
 
 } // namespace velt::test

@@ -140,7 +140,7 @@ TEST_P(VeltdRequestFaults, AreToldAndLeaveOldOrNew) {
         return std::to_string(answer_.status) + " " + answer_.body;
     };
     sweep.counts = isVeltds;
-    sweep.briefly = true;
+    sweep.share = Share::first;
     sweep.check = [&](const SweptRun& run) {
         if (run.call.name.empty()) {
             EXPECT_EQ(answer_.status, GetParam().good) << answer_.body;
@@ -171,6 +171,7 @@ const Request requests[] = {
     {"ATokenThatGoes", "DELETE", "/api/tokens/", "", "", 204},
     {"TheStatus", "GET", "/api/status", ""},
     {"TheLog", "GET", "/api/log", ""},
+    {"TheHealth", "GET", "/api/health", ""},
     {"Readiness", "GET", "/readyz", ""},
 };
 

@@ -163,7 +163,7 @@ TEST_F(VeltdStartFaults, AreToldAndOpenNothing) {
     sweep.counts = [](const SeenCall& call) {
         return isVeltds(call) && !(call.name == "write" && contains(call.subject, "eventfd"));
     };
-    sweep.briefly = true;
+    sweep.share = Share::first;
     sweep.check = [this](const SweptRun& run) {
         expectTruth(run);
         EXPECT_TRUE(seen_.stranger == 401 || seen_.stranger == 0) << seen_.stranger;
@@ -176,6 +176,20 @@ TEST_F(VeltdStartFaults, AreToldAndOpenNothing) {
         }
     };
     EXPECT_GE(sweepFaults(sweep), 50);
+}
+
+TEST_F(VeltdStartFaults, AreToldForEachThread) {
+    FaultSweep sweep;
+    sweep.prepare = bringBack;
+    sweep.act = [] { return becomeVeltd({}); };
+    sweep.meanwhile = [this](pid_t veltd) { lookAt(veltd); };
+    sweep.counts = [](const SeenCall& call) { return isVeltds(call) && call.name == "clone3"; };
+    sweep.share = Share::all;
+    sweep.check = [this](const SweptRun& run) {
+        expectTruth(run);
+        expectNothingLeft(run);
+    };
+    EXPECT_GE(sweepFaults(sweep), 8);
 }
 
 TEST_F(VeltdStartFaults, NeverServeWithoutTlsWhatIsToHaveIt) {

@@ -73,7 +73,7 @@ protected:
         FaultSweep sweep;
         sweep.act = act;
         sweep.counts = counts;
-        sweep.briefly = true;
+        sweep.share = Share::first;
         return sweep;
     }
 

@@ -71,7 +71,7 @@ protected:
         sweep.prepare = [mode] { bringBack(mode); };
         sweep.act = load;
         sweep.counts = counts;
-        sweep.briefly = true;
+        sweep.share = Share::first;
         sweep.check = [&](const SweptRun& run) {
             if (run.call.name.empty()) {
                 EXPECT_EQ(run.end.told, "done");
@@ -97,7 +97,7 @@ protected:
         sweep.prepare = [startsBanned] { bringBackBan(startsBanned); };
         sweep.act = act;
         sweep.counts = counts;
-        sweep.briefly = true;
+        sweep.share = Share::first;
         sweep.check = [&](const SweptRun& run) {
             next = run.call.name.empty() ? table() : next;
             const std::string now = table();
