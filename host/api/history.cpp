@@ -11,6 +11,7 @@
 
 #include <json/reader.h>
 
+#include <exception>
 #include <memory>
 #include <optional>
 #include <utility>
@@ -224,10 +225,20 @@ bool History::takeBackUnconfirmed() {
     bool good = true;
     for (const ChangeRecord& change : *waiting) { // the newest first, as they were laid on each other
         if (change.confirmBy && *change.confirmBy <= std::chrono::system_clock::now()) {
-            good = takeBack(change) && good;
+            good = tryToTakeBack(change) && good;
         }
     }
     return good;
+}
+
+bool History::tryToTakeBack(const ChangeRecord& change) {
+    try {
+        return takeBack(change);
+    } catch (const std::exception& error) {
+        log_.write("cannot take back the unconfirmed change " + std::to_string(change.id) + ": " +
+                   error.what());
+        return false;
+    }
 }
 
 bool History::takeBack(const ChangeRecord& change) {

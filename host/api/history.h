@@ -25,6 +25,7 @@ public:
 
 private:
     HttpResponse undo(const Call& call);
+    bool tryToTakeBack(const ChangeRecord& change);
     bool takeBack(const ChangeRecord& change);
 
     const ModuleTable& table_;

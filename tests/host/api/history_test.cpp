@@ -100,6 +100,14 @@ TEST_F(HostHistory, WhatWaitedAtTheEndOfVeltdIsTakenBackByTheNext) {
     EXPECT_TRUE(velt::test::waitUntil([&] { return timeOut() == 300; }, velt::test::patience));
 }
 
+TEST_F(HostHistory, AnUnconfirmedChangeThatIsDamagedEndsNothing) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    access.history[0].fields = "[7]";
+    EXPECT_TRUE(velt::test::waitUntil([&] { return logged("cannot take back the unconfirmed change 1: "); },
+                                      velt::test::patience));
+    EXPECT_EQ(get("/api/history/1").json()["state"], "waiting");
+}
+
 TEST_F(HostHistory, AFailedChangeDoesNotWait) {
     access.commitFails = true;
     access.sentence = "No luck.";
