@@ -11,6 +11,7 @@
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/error_number.h"
 #include "standalone/ports/port_probe.h"
+#include "standalone/process/replaced_programs.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -103,14 +104,26 @@ bool endsSessions(const Daemon& daemon, const DaemonPlan& plan, const std::strin
            daemon.takesRights(plan.folder.parent_path() / former, plan.folder);
 }
 
+/// A supervisor goes on with its own program when that is replaced. Only a start of both brings the new one,
+/// and ends the sessions: so where they end, and nowhere else.
+Result<SessionCount> start(const Daemon& daemon, const DaemonOrder& order, bool endsSessions) {
+    SupervisedDaemon supervised(daemon);
+    const DaemonState state = daemonState(daemon);
+    if (!endsSessions || !isAlive(state.supervisor) || !replacedFileOf(state.supervisor.pid)) {
+        return supervised.start(order, endsSessions);
+    }
+    VELT_ASSIGN_OR_RETURN(const auto ended, supervised.stop());
+    VELT_ASSIGN_OR_RETURN([[maybe_unused]] const auto none, supervised.start(order, false));
+    return ended;
+}
+
 Result<> startPlanned(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto plan, daemon.plan());
-    SupervisedDaemon supervised(daemon);
     if (!plan) {
-        return counted(daemon, supervised.stop());
+        return counted(daemon, SupervisedDaemon(daemon).stop());
     }
     const std::string former = daemonState(daemon).configurationHash;
-    auto started = counted(daemon, supervised.start(plan->order, endsSessions(daemon, *plan, former)));
+    auto started = counted(daemon, start(daemon, plan->order, endsSessions(daemon, *plan, former)));
     if (started) {
         if (pendingStops().isOpen()) {
             pendingStops().ended.insert(&daemon);

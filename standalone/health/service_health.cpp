@@ -3,7 +3,7 @@
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/health/checks.h"
 #include "standalone/health/greeting.h"
-#include "standalone/health/replaced_programs.h"
+#include "standalone/process/replaced_programs.h"
 
 #include <unistd.h>
 
@@ -163,7 +163,8 @@ Findings replacedProgramFindings() {
         }
         if (isAlive(state.supervisor)) {
             look(state.supervisor.pid, subject,
-                 "The supervisor of the " + std::string(daemon->label) + " daemon", restartOf(*daemon));
+                 "The supervisor of the " + std::string(daemon->label) + " daemon",
+                 restartOf(*daemon) + " --end-sessions");
         }
     }
     look(::getpid(), "host", "veltd", "systemctl restart veltd");

@@ -1,4 +1,5 @@
 // What is found about services that run, or should.
+#include "standalone/core/installed_files.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/control/services_fixture.h"
 #include "tests/standalone/health/health_test.h"
@@ -62,6 +63,30 @@ TEST_F(ServiceHealth, ADaemonOfAReplacedProgramIsNamed) {
                                                     "The FTP daemon still runs with the former version of " +
                                                         program + ", which has been replaced.",
                                                     "veltctl restart ftp"}}));
+}
+
+TEST_F(ServiceHealth, AReplacedSupervisorIsNamedAndGoesWithItsSessions) {
+    const auto program = root_ / "velt-supervise";
+    std::filesystem::copy_file(installedFile("velt-supervise"), program);
+    ASSERT_EQ(::setenv("VELT_LIBEXEC_DIR", root_.c_str(), 1), 0);
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    Client client(ftpPort_);
+    ASSERT_TRUE(client.isServed());
+    std::filesystem::copy_file(program, program.string() + ".new");
+    std::filesystem::rename(program.string() + ".new", program);
+    const Findings expected{{"program-replaced", Severity::warning, "ftp",
+                             "The supervisor of the FTP daemon still runs with the former version of " +
+                                 program.string() + ", which has been replaced.",
+                             "veltctl restart ftp --end-sessions"}};
+    EXPECT_EQ(replacedProgramFindings(), expected);
+    EXPECT_EQ(messageOf(restartServices(SessionPolicy::keep, "ftp")), "");
+    EXPECT_TRUE(client.isServed());
+    EXPECT_EQ(replacedProgramFindings(), expected);
+    EXPECT_EQ(restartServices(SessionPolicy::end, "ftp").valueOr({}),
+              (std::vector<ServiceSessions>{{"ftp", 1, 0}}));
+    EXPECT_FALSE(client.isServed());
+    EXPECT_TRUE(Client(ftpPort_).isServed());
+    EXPECT_EQ(replacedProgramFindings(), Findings());
 }
 
 TEST_F(ServiceHealth, AServiceThatAcceptsAndSaysNothingIsNamed) {

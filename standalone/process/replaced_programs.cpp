@@ -1,4 +1,4 @@
-#include "standalone/health/replaced_programs.h"
+#include "standalone/process/replaced_programs.h"
 
 #include "base/file.h"
 #include "base/text.h"

@@ -1,5 +1,5 @@
 // Programs that go on after their files were replaced.
-#include "standalone/health/replaced_programs.h"
+#include "standalone/process/replaced_programs.h"
 #include "tests/support/temporary_folder.h"
 #include "tests/support/waiting.h"
 
