@@ -50,8 +50,9 @@ Json::Value ApiClient::read(const ApiMethod& method) {
     return get(pathOf(method));
 }
 
-Json::Value ApiClient::call(const ApiMethod& method, const Json::Value& parameters) {
-    return post(pathOf(method), parameters);
+Json::Value ApiClient::call(const ApiMethod& method, const Json::Value& parameters,
+                            const std::string& query) {
+    return post(pathOf(method) + query, parameters);
 }
 
 void ApiClient::changeWhatWasRead(const std::function<void()>& change) {
@@ -86,8 +87,8 @@ Json::Value ApiClient::patch(const std::string& path, const Json::Value& body) {
     return exchange("PATCH", path, compactJson(body));
 }
 
-void ApiClient::remove(const std::string& path) {
-    exchange("DELETE", path, std::nullopt);
+Json::Value ApiClient::remove(const std::string& path) {
+    return exchange("DELETE", path, std::nullopt);
 }
 
 void ApiClient::follow(const std::string& path, const std::function<bool(std::string_view)>& onText,

@@ -24,8 +24,9 @@ public:
     /// A method that takes no parameters and changes nothing.
     Json::Value read(const ApiMethod& method);
 
-    /// Any method with its parameters. Null when the method answers without a value.
-    Json::Value call(const ApiMethod& method, const Json::Value& parameters);
+    /// Any method with its parameters; the query ("?dry_run=true") says how it is to change something. Null
+    /// when the method answers without a value.
+    Json::Value call(const ApiMethod& method, const Json::Value& parameters, const std::string& query = {});
 
     /// Runs `change`, which reads the settings and then calls a method that changes them. If others change
     /// something in between, the server refuses the call and `change` runs again from its start; Failure
@@ -36,7 +37,7 @@ public:
     Json::Value get(const std::string& path);
     Json::Value post(const std::string& path, const Json::Value& body);
     Json::Value patch(const std::string& path, const Json::Value& body);
-    void remove(const std::string& path);
+    Json::Value remove(const std::string& path);
 
     /// As HttpClient::follow; an answer other than 200 is thrown.
     void follow(const std::string& path, const std::function<bool(std::string_view)>& onText,

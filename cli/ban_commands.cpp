@@ -1,5 +1,6 @@
 #include "base/json_value.h"
 #include "base/printable.h"
+#include "cli/change_report.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -31,9 +32,18 @@ void listBans(Context& context) {
     }
 }
 
-void liftBan(Context& context, const std::string& address) {
-    context.api.remove("/api/bans/" + percentEncode(address));
-    if (!context.wroteJson(jsonObject({{"lifted", address}}))) {
+struct LiftOptions {
+    std::string address;
+    bool dryRun = false;
+};
+
+void liftBan(Context& context, const LiftOptions& options) {
+    const std::string& address = options.address;
+    const Json::Value answer =
+        context.api.remove("/api/bans/" + percentEncode(address) + dryRunQuery(options.dryRun));
+    if (options.dryRun) {
+        writeReport(context, answer);
+    } else if (!context.wroteJson(jsonObject({{"lifted", address}}))) {
         context.console.out << printable(address) << " is no longer banned.\n";
     }
 }
@@ -41,7 +51,7 @@ void liftBan(Context& context, const std::string& address) {
 } // namespace
 
 void addBanCommands(CLI::App& app, Command& chosen) {
-    auto address = std::make_shared<std::string>();
+    auto options = std::make_shared<LiftOptions>();
     CLI::App* bans = app.add_subcommand("bans", "Show and lift the bans after too many failed logins");
     bans->require_subcommand(1);
 
@@ -49,10 +59,11 @@ void addBanCommands(CLI::App& app, Command& chosen) {
     onWords(list, chosen, listBans);
 
     CLI::App* lift = bans->add_subcommand("lift", "Let an address log in again");
-    lift->add_option("address", *address, "The address that 'bans list' shows, or one of its network")
+    lift->add_option("address", options->address, "The address that 'bans list' shows, or one of its network")
         ->required()
         ->type_name("");
-    onWords(lift, chosen, [address](Context& context) { liftBan(context, *address); });
+    addDryRun(lift, options->dryRun);
+    onWords(lift, chosen, [options](Context& context) { liftBan(context, *options); });
 }
 
 } // namespace velt::cli

@@ -1,3 +1,4 @@
+#include "cli/change_report.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -15,6 +16,7 @@ struct CallOptions {
     bool list = false;
     ApiMethod method{"", 0, ""};
     std::string parameters = "{}";
+    ChangeOptions change;
 };
 
 void listMethods(Context& context) {
@@ -46,8 +48,10 @@ void callMethod(Context& context, const CallOptions& options) {
                       "Pass an object such as '{\"enable_ftp\": true}', quoted for the shell.",
                       {parameters ? "" : parameters.error().message});
     }
-    const Json::Value answer = context.api.call(options.method, *parameters);
-    if (!answer.isNull()) {
+    const Json::Value answer = context.api.call(options.method, *parameters, options.change.query());
+    if (answer.isObject() && answer["dry_run"] == true) {
+        writeReport(context, answer);
+    } else if (!answer.isNull()) {
         writeJson(context.console.out, answer);
     }
 }
@@ -65,6 +69,7 @@ void addCallCommand(CLI::App& app, Command& chosen) {
     call->add_option("method", options->method.method, "Name of the method")->type_name("");
     call->add_option("parameters", options->parameters, "A JSON object, or - for the standard input")
         ->type_name("");
+    addChangeOptions(call, options->change);
     onWords(call, chosen, [options](Context& context) { callMethod(context, *options); });
 }
 

@@ -135,8 +135,16 @@ std::string ChangeOptions::query() const {
     return text;
 }
 
+void addDryRun(CLI::App* command, bool& dryRun) {
+    command->add_flag("-n,--dry-run", dryRun, "Only show what would be done");
+}
+
+std::string dryRunQuery(bool dryRun) {
+    return dryRun ? "?dry_run=true" : "";
+}
+
 void addChangeOptions(CLI::App* command, ChangeOptions& options) {
-    command->add_flag("-n,--dry-run", options.dryRun, "Only show what would be done");
+    addDryRun(command, options.dryRun);
     CLI::Option* const keep =
         command->add_flag("--keep-sessions", options.keepSessions, "End no open session");
     command
@@ -155,6 +163,17 @@ void changeSettings(Context& context, const Json::Value& patch, const ChangeOpti
     writeReport(context, context.api.patch(settingsPath + options.query(), patch), section);
 }
 
+void writeChanges(std::ostream& out, const Json::Value& changes, const std::string& section) {
+    for (const Json::Value& change : changes) {
+        const std::string name = printable(nameOf(change, section));
+        if (change["to"].isArray()) {
+            writeRuleChanges(out, name, change);
+        } else {
+            out << name << ": " << shown(change["from"]) << " -> " << shown(change["to"]) << '\n';
+        }
+    }
+}
+
 void writeReport(Context& context, const Json::Value& report, const std::string& section) {
     const bool dryRun = report["dry_run"] == true;
     const bool changes = !report["changes"].empty() || !report["effects"].empty();
@@ -165,14 +184,7 @@ void writeReport(Context& context, const Json::Value& report, const std::string&
         return;
     }
     std::ostream& out = context.console.out;
-    for (const Json::Value& change : report["changes"]) {
-        const std::string name = printable(nameOf(change, section));
-        if (change["to"].isArray()) {
-            writeRuleChanges(out, name, change);
-        } else {
-            out << name << ": " << shown(change["from"]) << " -> " << shown(change["to"]) << '\n';
-        }
-    }
+    writeChanges(out, report["changes"], section);
     if (dryRun) {
         writePlan(out, report);
         out << (changes ? "Nothing was changed: this was a dry run.\n" : "Nothing to change.\n");

@@ -6,6 +6,7 @@
 
 #include <json/value.h>
 
+#include <iosfwd>
 #include <string>
 
 namespace velt::cli {
@@ -25,6 +26,12 @@ struct ChangeOptions {
 /// the parser.
 void addChangeOptions(CLI::App* command, ChangeOptions& options);
 
+/// Adds --dry-run alone, to a command that changes something else than settings. It outlives the parser.
+void addDryRun(CLI::App* command, bool& dryRun);
+
+/// "?dry_run=true"; "" without.
+std::string dryRunQuery(bool dryRun);
+
 /// The path of all settings.
 inline constexpr const char* settingsPath = "/api/settings";
 
@@ -32,6 +39,9 @@ inline constexpr const char* settingsPath = "/api/settings";
 /// the names of settings: "timeout" for "/ftp/timeout".
 void changeSettings(Context& context, const Json::Value& patch, const ChangeOptions& options,
                     const std::string& section = "");
+
+/// Writes a line for each field that is another one, and for each rule. `section` as above.
+void writeChanges(std::ostream& out, const Json::Value& changes, const std::string& section = "");
 
 /// Writes the server's answer to a change. After a dry run of something that would change, the command's exit
 /// code says so.

@@ -41,6 +41,7 @@ void addDoctorCommand(CLI::App& app, Command& chosen);
 void addLogCommand(CLI::App& app, Command& chosen);
 void addRestartCommand(CLI::App& app, Command& chosen);
 void addHistoryCommands(CLI::App& app, Command& chosen);
+void addDiffCommand(CLI::App& app, Command& chosen);
 void addBanCommands(CLI::App& app, Command& chosen);
 void addTokenCommands(CLI::App& app, Command& chosen);
 void addDocumentCommands(CLI::App& app, Command& chosen);

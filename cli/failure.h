@@ -18,7 +18,7 @@ enum class ExitCode {
     conflict = 4,    ///< the input conflicts with something else: a port, a share
     platform = 5,    ///< the server failed to carry it out
     access = 6,      ///< the server cannot be reached, or does not allow this user or token to do it
-    wouldChange = 7, ///< no failure: a dry run found something to change
+    wouldChange = 7, ///< no failure: a dry run found something to change, or diff a difference
     unhealthy = 8,   ///< done, and the server has errors or warnings to tell of
 };
 

@@ -92,8 +92,12 @@ void undo(Context& context, const HistoryOptions& options) {
 void confirm(Context& context, const HistoryOptions& options) {
     const long long id = meant(
         context, options.id, [](const std::string& state) { return state == "waiting"; }, "to confirm");
-    context.api.post("/api/history/" + std::to_string(id) + "/confirm", Json::objectValue);
-    if (!context.wroteJson(jsonObject({{"confirmed", Json::Int64{id}}}))) {
+    const Json::Value answer = context.api.post("/api/history/" + std::to_string(id) + "/confirm" +
+                                                    dryRunQuery(options.change.dryRun),
+                                                Json::objectValue);
+    if (options.change.dryRun) {
+        writeReport(context, answer);
+    } else if (!context.wroteJson(jsonObject({{"confirmed", Json::Int64{id}}}))) {
         context.console.out << "Change " << id << " stays.\n";
     }
 }
@@ -125,6 +129,7 @@ void addHistoryCommands(CLI::App& app, Command& chosen) {
 
     CLI::App* keep = app.add_subcommand("confirm", "Keep a change that else is taken back");
     addId(keep, *options, "The change (default: the newest that waits)");
+    addDryRun(keep, options->change.dryRun);
     onWords(keep, chosen, [options](Context& context) { confirm(context, *options); });
 }
 

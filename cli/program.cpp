@@ -14,7 +14,7 @@ namespace {
 
 constexpr const char* exitCodes =
     "Exit codes: 0 done, 1 local file, 2 usage, 3 input refused, 4 conflict, 5 the server failed, "
-    "6 no connection or no access, 7 a dry run found something to change, 8 the server is not well.";
+    "6 no connection or no access, 7 a dry run or diff found something, 8 the server is not well.";
 
 void addGlobalOptions(CLI::App& app, GlobalOptions& options) {
     app.add_flag("--json", options.json, "Write JSON, for programs");
@@ -87,6 +87,7 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     addChrootCommands(app, chosen);
     addRestartCommand(app, chosen);
     addHistoryCommands(app, chosen);
+    addDiffCommand(app, chosen);
     addBanCommands(app, chosen);
     addTokenCommands(app, chosen);
     addDocumentCommands(app, chosen);

@@ -1,4 +1,5 @@
 #include "base/printable.h"
+#include "cli/change_report.h"
 #include "cli/command.h"
 #include "cli/json_io.h"
 
@@ -15,12 +16,18 @@ namespace {
 struct RestartOptions {
     std::string service;
     bool endSessions = false;
+    bool dryRun = false;
 };
 
 void restart(Context& context, const RestartOptions& options) {
     std::string query = options.endSessions ? "?sessions=end" : "?sessions=keep";
     query += options.service.empty() ? "" : "&service=" + percentEncode(options.service);
+    query += options.dryRun ? "&dry_run=true" : "";
     const Json::Value answer = context.api.post("/api/restart" + query, Json::objectValue);
+    if (options.dryRun) {
+        writeReport(context, answer);
+        return;
+    }
     if (context.wroteJson(answer)) {
         return;
     }
@@ -42,6 +49,7 @@ void addRestartCommand(CLI::App& app, Command& chosen) {
         ->check(CLI::IsMember({"ftp", "sftp"}))
         ->type_name("");
     command->add_flag("--end-sessions", options->endSessions, "End the open sessions; else they go on");
+    addDryRun(command, options->dryRun);
     onWords(command, chosen, [options](Context& context) { restart(context, *options); });
 }
 

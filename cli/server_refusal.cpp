@@ -72,7 +72,7 @@ std::string absenceHint(const std::string& path) {
     if (path.starts_with("/api/bans/")) {
         return "'veltctl bans list' lists the bans.";
     }
-    if (path.starts_with("/api/history/")) {
+    if (path.starts_with("/api/history/") || path == "/api/diff") {
         return "'veltctl history' lists the changes.";
     }
     return path.starts_with("/api/tokens/") ? "'veltctl tokens list' lists the tokens."

@@ -1,5 +1,6 @@
 #include "base/json_value.h"
 #include "base/printable.h"
+#include "cli/change_report.h"
 #include "cli/command.h"
 #include "cli/failure.h"
 #include "cli/json_io.h"
@@ -18,6 +19,7 @@ struct TokenOptions {
     std::string name;
     std::string role = "viewer";
     std::string id;
+    bool dryRun = false;
 };
 
 void listTokens(Context& context) {
@@ -34,8 +36,12 @@ void listTokens(Context& context) {
 }
 
 void createToken(Context& context, const TokenOptions& options) {
-    const Json::Value token =
-        context.api.post("/api/tokens", jsonObject({{"name", options.name}, {"role", options.role}}));
+    const Json::Value token = context.api.post("/api/tokens" + dryRunQuery(options.dryRun),
+                                               jsonObject({{"name", options.name}, {"role", options.role}}));
+    if (options.dryRun) {
+        writeReport(context, token);
+        return;
+    }
     if (context.wroteJson(token)) {
         return;
     }
@@ -47,8 +53,11 @@ void createToken(Context& context, const TokenOptions& options) {
 }
 
 void deleteToken(Context& context, const TokenOptions& options) {
-    context.api.remove("/api/tokens/" + percentEncode(options.id));
-    if (!context.wroteJson(jsonObject({{"deleted", options.id}}))) {
+    const Json::Value answer =
+        context.api.remove("/api/tokens/" + percentEncode(options.id) + dryRunQuery(options.dryRun));
+    if (options.dryRun) {
+        writeReport(context, answer);
+    } else if (!context.wroteJson(jsonObject({{"deleted", options.id}}))) {
         context.console.out << "Token " << printable(options.id) << " is no longer valid.\n";
     }
 }
@@ -68,10 +77,12 @@ void addTokenCommands(CLI::App& app, Command& chosen) {
     create->add_option("--role", options->role, "viewer may only read (default), admin may change everything")
         ->check(CLI::IsMember({"admin", "viewer"}))
         ->type_name("admin|viewer");
+    addDryRun(create, options->dryRun);
     onWords(create, chosen, [options](Context& context) { createToken(context, *options); });
 
     CLI::App* remove = tokens->add_subcommand("delete", "Delete a token, so that it is no longer valid");
     remove->add_option("id", options->id, "The id that 'tokens list' shows")->required()->type_name("");
+    addDryRun(remove, options->dryRun);
     onWords(remove, chosen, [options](Context& context) { deleteToken(context, *options); });
 }
 

@@ -28,6 +28,7 @@
 
 // On whose behalf, what happened, and what was written down.
 #include "standalone/journal/admin_log.h"
+#include "standalone/journal/catalogue.h"
 #include "standalone/journal/change_history.h"
 #include "standalone/journal/request_actor.h"
 #include "standalone/journal/subscriptions.h"

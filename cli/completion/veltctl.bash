@@ -5,7 +5,7 @@ _veltctl_words() {
     local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
         enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
     case $1 in
-        '') echo 'status doctor restart log events ftp security sftp shares chroot history undo confirm bans tokens export import call' ;;
+        '') echo 'status doctor restart log events ftp security sftp shares chroot history diff undo confirm bans tokens export import call' ;;
         ftp | security | sftp) echo 'get set' ;;
         'ftp set') echo "$ftp utf8_mode=" ;;
         'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
@@ -32,11 +32,12 @@ _veltctl_options() {
             'chroot rules add' | 'chroot rules remove' | undo | import)
             echo '--dry-run --keep-sessions --end-sessions --confirm-within' ;;
         history) echo '--before --limit' ;;
-        restart) echo '--end-sessions' ;;
+        restart) echo '--dry-run --end-sessions' ;;
+        confirm | 'bans lift' | 'tokens delete') echo '--dry-run' ;;
         'chroot users list') echo '--others --offset --limit --type --domain --filter' ;;
-        'tokens create') echo '--role' ;;
+        'tokens create') echo '--dry-run --role' ;;
         export) echo '--output' ;;
-        call) echo '--list' ;;
+        call) echo '--dry-run --keep-sessions --end-sessions --confirm-within --list' ;;
     esac
 }
 
@@ -119,7 +120,7 @@ _veltctl() {
         return
     fi
     case $command in
-        import | 'chroot rules save') _veltctl_files "$current" ;;
+        import | diff | 'chroot rules save') _veltctl_files "$current" ;;
         *) COMPREPLY=($(compgen -W "$(_veltctl_words "$command")" -- "$current")) ;;
     esac
     [[ ${COMPREPLY[*]:-} != *= ]] || compopt -o nospace 2>/dev/null

@@ -4,6 +4,7 @@
 #include "host/api/log_page.h"
 #include "host/api/problem.h"
 #include "host/api/restart.h"
+#include "host/api/settings_diff.h"
 #include "host/api/status.h"
 #include "host/api/tokens.h"
 #include "host/base/percent_encoding.h"
@@ -99,6 +100,7 @@ void App::addRoutes(const ModuleTable& table) {
     add(rows_.routes());
     add(settings_.routes());
     add(history_.routes());
+    add(settingsDiffRoutes(table));
     add({restartRoute(log_)});
     add(statusRoutes(table));
     add(banRoutes(log_));

@@ -2,12 +2,18 @@
 
 #include "base/json_value.h"
 #include "base/utc_text.h"
+#include "host/api/changes.h"
 #include "host/api/problem.h"
 #include "host/module/platform_request.h"
+
+#include <algorithm>
+#include <variant>
 
 namespace velt::host {
 
 namespace {
+
+constexpr std::uint32_t liftedEvent = 0x11BF0002;
 
 Json::Value toObject(const Ban& ban) {
     return jsonObject({{"address", toText(ban.source)},
@@ -26,8 +32,35 @@ HttpResponse list(const Call& call) {
         200, jsonObject({{"bans", jsonArray(current->bans, describe)}, {"firewall", current->firewall}}));
 }
 
+HttpResponse noSuchBan(const std::string& address, const Call& call) {
+    return problem(404, "There is no ban of " + address + ".", call.id);
+}
+
+/// What lifting the ban would do. The platform writes the entry itself.
+HttpResponse liftPlan(const std::string& address, const Call& call) {
+    const auto current = currentBans();
+    if (!current) {
+        return problem(500, current.error().message, call.id);
+    }
+    const auto source = parseIpNetwork(address);
+    const auto isMeant = [&](const Ban& ban) { return source && ban.source.contains(*source); };
+    const auto ban = std::ranges::find_if(current->bans, isMeant);
+    if (ban == current->bans.end()) {
+        return noSuchBan(address, call);
+    }
+    return dryRunAnswer({{StepKind::store, "bans"},
+                         {StepKind::logEntry, velt::sentenceOf(liftedEvent, {toText(ban->source)})}});
+}
+
 HttpResponse lift(HostLog& log, const Call& call) {
+    const auto dryRun = parseDryRun(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
+        return fieldProblem(400, *bad, " No ban was lifted.", call.id);
+    }
     const std::string& address = call.path.back();
+    if (std::get<bool>(dryRun)) {
+        return liftPlan(address, call);
+    }
     const PlatformRequest request(call.principal.actor, call.principal.address);
     const auto lifted = liftBan(address);
     if (!lifted) {
@@ -35,7 +68,7 @@ HttpResponse lift(HostLog& log, const Call& call) {
         return problem(500, lifted.error().message, call.id);
     }
     if (!*lifted) {
-        return problem(404, "There is no ban of " + address + ".", call.id);
+        return noSuchBan(address, call);
     }
     log.write(call.id, "ban of " + address + " lifted by " + call.principal.actor);
     return {204, "", "", {}};

@@ -64,4 +64,17 @@ std::variant<ChangeOptions, FieldError> parseChangeOptions(const std::string& qu
     return options;
 }
 
+std::variant<bool, FieldError> parseDryRun(const std::string& query) {
+    ChangeOptions options;
+    for (const auto& [key, value] : queryParameters(query)) {
+        if (key != known[0].key) {
+            return FieldError{key, "only dry_run"};
+        }
+        if (!value || !takeDryRun(*value, options)) {
+            return FieldError{key, known[0].expected};
+        }
+    }
+    return options.dryRun;
+}
+
 } // namespace velt::host

@@ -22,6 +22,9 @@ struct ChangeOptions {
 /// parameter that is wrong.
 std::variant<ChangeOptions, FieldError> parseChangeOptions(const std::string& query);
 
+/// The same for a change that knows no other option than "dry_run": whether it is one.
+std::variant<bool, FieldError> parseDryRun(const std::string& query);
+
 } // namespace velt::host
 
 #endif

@@ -1,6 +1,7 @@
 #include "host/api/changes.h"
 
 #include "base/json_value.h"
+#include "host/api/audit.h"
 #include "host/api/change_summary.h"
 #include "host/api/problem.h"
 #include "host/api/service_status.h"
@@ -13,10 +14,6 @@
 namespace velt::host {
 
 namespace {
-
-constexpr int logCategory = 2;
-constexpr int logLevel = 1;
-constexpr unsigned changedEvent = 0x11BF0003;
 
 /// A change that the platform could not do, though the module accepted it.
 HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId) {
@@ -48,6 +45,13 @@ Json::Value toObject(const ChangeReport& report) {
         object["id"] = Json::Int64{*report.id};
     }
     return object;
+}
+
+HttpResponse dryRunAnswer(ChangeSteps steps) {
+    ChangeReport report;
+    report.dryRun = true;
+    report.steps = std::move(steps);
+    return jsonResponse(200, toObject(report));
 }
 
 Changes::Changes(const ModuleTable& table, Metrics& metrics, EventHub& events, HostLog& log)
@@ -150,9 +154,8 @@ void Changes::writeDown(const ChangeRequest& request, ChangeReport& report) {
             report.warnings.push_back("The change is not in the history. " + recorded.error().message);
         }
     }
-    const std::string summary = summaryOf(report.changes);
-    if (const auto logged = logEvent(logCategory, logLevel, changedEvent,
-                                     {request.way.c_str(), summary.c_str(), nullptr, nullptr});
+    if (const auto logged =
+            writeAudit({AuditEvent::settingsChanged, {request.way, summaryOf(report.changes), {}, {}}});
         !logged) {
         report.warnings.push_back("The change is not in the administrator log. " + logged.error().message);
     }

@@ -46,6 +46,9 @@ struct ChangeReport {
 /// {"changes", "effects", "sessions_ended", "warnings", "down", "id"}
 Json::Value toObject(const ChangeReport& report);
 
+/// The answer to a dry run of something that is not a change of settings.
+HttpResponse dryRunAnswer(ChangeSteps steps);
+
 /// Thread-safe, if one change runs at a time.
 class Changes {
 public:

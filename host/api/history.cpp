@@ -3,16 +3,15 @@
 #include "base/json_value.h"
 #include "base/number_text.h"
 #include "base/utc_text.h"
+#include "host/api/audit.h"
 #include "host/api/problem.h"
+#include "host/api/recorded_change.h"
 #include "host/api/settings_document.h"
 #include "host/base/json.h"
 #include "host/base/query_text.h"
 #include "host/base/random_text.h"
 
-#include <json/reader.h>
-
 #include <exception>
-#include <memory>
 #include <optional>
 #include <utility>
 
@@ -20,20 +19,7 @@ namespace velt::host {
 
 namespace {
 
-constexpr int logCategory = 2;
-constexpr int logLevel = 1;
-constexpr unsigned takenBackEvent = 0x11BF0004;
 constexpr std::int64_t longestPage = 1000;
-
-/// What `changes` of a record says; a list.
-Json::Value changesOf(const ChangeRecord& change) {
-    Json::Value value;
-    const std::unique_ptr<Json::CharReader> reader(Json::CharReaderBuilder().newCharReader());
-    const char* const text = change.fields.data();
-    return reader->parse(text, text + change.fields.size(), &value, nullptr) && value.isArray()
-               ? value
-               : Json::Value(Json::arrayValue);
-}
 
 Json::Value toObject(const ChangeRecord& change) {
     Json::Value object = jsonObject({{"id", Json::Int64{change.id}},
@@ -42,18 +28,11 @@ Json::Value toObject(const ChangeRecord& change) {
                                      {"address", change.address},
                                      {"way", change.way},
                                      {"state", changeStateName(change.state)},
-                                     {"changes", changesOf(change)}});
+                                     {"changes", fieldsOf(change)}});
     if (change.confirmBy) {
         object["confirm_by"] = timestamp(*change.confirmBy);
     }
     return object;
-}
-
-/// The place of a JSON Pointer with one or two names, all that records have.
-Json::Value& placeIn(Json::Value& document, const std::string& pointer) {
-    const std::size_t slash = pointer.find('/', 1);
-    Json::Value& section = document[pointer.substr(1, slash == std::string::npos ? slash : slash - 1)];
-    return slash == std::string::npos ? section : section[pointer.substr(slash + 1)];
 }
 
 /// The document without the change, and what stands in the way: fields that have another value since.
@@ -64,7 +43,7 @@ struct Undoing {
 
 Undoing undoing(const ChangeRecord& change, const Json::Value& current) {
     Undoing result{current, {}};
-    for (const Json::Value& each : changesOf(change)) {
+    for (const Json::Value& each : fieldsOf(change)) {
         Json::Value& place = placeIn(result.wanted, each["field"].asString());
         if (place == each["to"]) {
             place = each["from"];
@@ -136,7 +115,11 @@ HttpResponse list(const Call& call) {
                           jsonArray(*changes, [](const ChangeRecord& each) { return toObject(each); })}}));
 }
 
-HttpResponse confirm(const Call& call) {
+HttpResponse confirm(HostLog& log, const Call& call) {
+    const auto dryRun = parseDryRun(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
+        return fieldProblem(400, *bad, " Nothing was confirmed.", call.id);
+    }
     const auto change = namedChange(call);
     const auto* const record = std::get_if<ChangeRecord>(&change);
     if (record == nullptr) {
@@ -148,8 +131,16 @@ HttpResponse confirm(const Call& call) {
                            changeStateName(record->state) + ".",
                        call.id);
     }
+    const AuditEntry entry{AuditEvent::confirmed, {std::to_string(record->id), {}, {}, {}}};
+    if (std::get<bool>(dryRun)) {
+        return dryRunAnswer({{StepKind::store, "history"}, stepOf(entry)});
+    }
     const auto stored = setChangeState(record->id, ChangeState::confirmed);
-    return stored ? HttpResponse{204, "", "", {}} : problem(500, stored.error().message, call.id);
+    if (!stored) {
+        return problem(500, stored.error().message, call.id);
+    }
+    writeAudit(entry, log, call);
+    return {204, "", "", {}};
 }
 
 HttpResponse changedSince(const std::vector<FieldError>& conflicts, const Call& call) {
@@ -178,7 +169,11 @@ std::vector<Route> History::routes() {
          Kind::write,
          [this](const Call& call) { return undo(call); }},
         // As a write: it must not come between the look for unconfirmed changes and their undoing.
-        {"POST", {"api", "history", "*", "confirm"}, true, Kind::write, confirm},
+        {"POST",
+         {"api", "history", "*", "confirm"},
+         true,
+         Kind::write,
+         [this](const Call& call) { return confirm(log_, call); }},
     };
 }
 
@@ -249,8 +244,7 @@ bool History::takeBack(const ChangeRecord& change) {
         log_.write(call.id, current.error().message);
         return false;
     }
-    const auto logged =
-        logEvent(logCategory, logLevel, takenBackEvent, {id.c_str(), nullptr, nullptr, nullptr});
+    const auto logged = writeAudit({AuditEvent::takenBack, {id, {}, {}, {}}});
     const HttpResponse response =
         settings_.store(*current, undoing(change, *current).wanted, "undo " + id, {}, call);
     if (response.status != 200) {

@@ -1,6 +1,8 @@
 #include "host/api/restart.h"
 
 #include "base/json_value.h"
+#include "host/api/audit.h"
+#include "host/api/changes.h"
 #include "host/api/problem.h"
 #include "host/base/query_text.h"
 #include "host/module/platform_request.h"
@@ -15,13 +17,24 @@ namespace {
 struct Wish {
     std::string service; ///< "" for all
     SessionPolicy sessions = SessionPolicy::keep;
+    bool dryRun = false;
 };
 
 bool isService(const std::string& name) {
     return std::ranges::count(storedServices(), name, &StoredService::daemon) != 0;
 }
 
-/// Reads "service=ftp&sessions=end".
+const char* expectedFor(const std::string& key) {
+    if (key == "service") {
+        return "ftp or sftp";
+    }
+    if (key == "sessions") {
+        return "keep or end";
+    }
+    return key == "dry_run" ? "true or false" : "one of service, sessions or dry_run";
+}
+
+/// Reads "service=ftp&sessions=end&dry_run=true".
 std::variant<Wish, FieldError> wishIn(const std::string& query) {
     Wish wish;
     for (const auto& [key, value] : queryParameters(query)) {
@@ -29,10 +42,10 @@ std::variant<Wish, FieldError> wishIn(const std::string& query) {
             wish.service = *value;
         } else if (key == "sessions" && (value == "keep" || value == "end")) {
             wish.sessions = value == "end" ? SessionPolicy::end : SessionPolicy::keep;
+        } else if (key == "dry_run" && (value == "true" || value == "false")) {
+            wish.dryRun = value == "true";
         } else {
-            return FieldError{key, key == "service"    ? "ftp or sftp"
-                                   : key == "sessions" ? "keep or end"
-                                                       : "service or sessions"};
+            return FieldError{key, expectedFor(key)};
         }
     }
     return wish;
@@ -42,18 +55,57 @@ Json::Value toObject(const ServiceSessions& sessions) {
     return jsonObject({{"service", sessions.service}, {"ended", sessions.ended}, {"kept", sessions.kept}});
 }
 
+/// "ftp: 3 sessions went on, 0 ended"
+std::string textOf(const std::vector<ServiceSessions>& services) {
+    std::string text;
+    for (const auto& [service, ended, kept] : services) {
+        text += (text.empty() ? "" : "; ") + service + ": " + std::to_string(kept) + " sessions went on, " +
+                std::to_string(ended) + " ended";
+    }
+    return text.empty() ? "there were no sessions" : text;
+}
+
+AuditEntry entryOf(const Wish& wish, const std::vector<ServiceSessions>& services) {
+    return {AuditEvent::restarted,
+            {wish.service.empty() ? "all services" : wish.service, textOf(services), {}, {}}};
+}
+
+/// Stages the starts, and drops them.
+HttpResponse restartPlan(const Wish& wish, const Call& call) {
+    const auto change = SettingsChange::begin();
+    if (!change) {
+        return problem(500, change.error().message, call.id);
+    }
+    if (const auto staged = restartServices(wish.sessions, wish.service); !staged) {
+        return problem(500, staged.error().message, call.id);
+    }
+    const auto plan = (*change)->plan(wish.sessions);
+    if (!plan) {
+        return problem(500, plan.error().message, call.id);
+    }
+    ChangeReport report;
+    report.dryRun = true;
+    report.steps = plan->steps;
+    report.sessionsEnded = plan->sessionsEnded;
+    return jsonResponse(200, toObject(report));
+}
+
 HttpResponse restart(HostLog& log, const Call& call) {
     const auto wish = wishIn(call.request.query());
     if (const auto* const bad = std::get_if<FieldError>(&wish)) {
         return fieldProblem(400, *bad, "", call.id);
     }
     const PlatformRequest request(call.principal.actor, call.principal.address);
-    const auto& [service, policy] = std::get<Wish>(wish);
-    const auto done = restartServices(policy, service);
+    const auto& wanted = std::get<Wish>(wish);
+    if (wanted.dryRun) {
+        return restartPlan(wanted, call);
+    }
+    const auto done = restartServices(wanted.sessions, wanted.service);
     if (!done) {
         log.write(call.id, "restart: " + done.error().message);
         return problem(500, done.error().message, call.id);
     }
+    writeAudit(entryOf(wanted, *done), log, call);
     return jsonResponse(200, jsonObject({{"services", jsonArray(*done, [](const ServiceSessions& each) {
                                               return toObject(each);
                                           })}}));

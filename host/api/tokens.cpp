@@ -2,8 +2,13 @@
 
 #include "base/json_value.h"
 #include "base/utf8.h"
+#include "host/api/audit.h"
+#include "host/api/changes.h"
 #include "host/api/problem.h"
 #include "host/base/json.h"
+
+#include <algorithm>
+#include <variant>
 
 namespace velt::host {
 
@@ -24,7 +29,17 @@ HttpResponse list(const TokenStore& store) {
     return jsonResponse(200, jsonObject({{"tokens", jsonArray(store.tokens(), describe)}}));
 }
 
+constexpr const char* noneDeleted = " No token was deleted.";
+
+AuditEntry entryOf(AuditEvent event, const Token& token) {
+    return {event, {token.name, roleName(token.role), token.id, {}}};
+}
+
 HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
+    const auto dryRun = parseDryRun(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
+        return fieldProblem(400, *bad, noneMade, call.id);
+    }
     const auto body = parseObject(call.request.body);
     if (!body) {
         return notAnObject(body.error(), noneMade, call.id);
@@ -40,9 +55,15 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     if (!role) {
         return fieldProblem(422, {"role", "\"admin\" or \"viewer\""}, noneMade, call.id);
     }
+    if (std::get<bool>(dryRun)) {
+        return dryRunAnswer(
+            {{StepKind::store, "tokens"},
+             stepOf(entryOf(AuditEvent::tokenMade, {"not known yet", name.asString(), *role, {}, {}}))});
+    }
     const auto [token, text] = store.create(name.asString(), *role);
     log.write(call.id, "token " + token.id + " created for " + token.name + " (" + roleName(token.role) +
                            ") by " + call.principal.actor);
+    writeAudit(entryOf(AuditEvent::tokenMade, token), log, call);
     Json::Value value = toObject(token);
     value.removeMember("created");
     value["token"] = text;
@@ -50,11 +71,22 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
 }
 
 HttpResponse remove(TokenStore& store, HostLog& log, const Call& call) {
+    const auto dryRun = parseDryRun(call.request.query());
+    if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
+        return fieldProblem(400, *bad, noneDeleted, call.id);
+    }
     const std::string& id = call.path.back();
-    if (!store.remove(id)) {
+    const auto tokens = store.tokens();
+    const auto token = std::ranges::find(tokens, id, &Token::id);
+    const bool found = token != tokens.end();
+    if (found && std::get<bool>(dryRun)) {
+        return dryRunAnswer({{StepKind::store, "tokens"}, stepOf(entryOf(AuditEvent::tokenDeleted, *token))});
+    }
+    if (!found || !store.remove(id)) {
         return problem(404, "There is no token with the id " + id + ".", call.id);
     }
-    log.write(call.id, "token " + id + " removed by " + call.principal.actor);
+    log.write(call.id, "token " + id + " deleted by " + call.principal.actor);
+    writeAudit(entryOf(AuditEvent::tokenDeleted, *token), log, call);
     return {204, "", "", {}};
 }
 

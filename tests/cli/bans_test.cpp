@@ -31,6 +31,11 @@ TEST_F(BansTest, ABanIsLifted) {
     EXPECT_EQ(jsonOf(run({"bans", "lift", "2001:db8::/64", "--json"}).out)["lifted"], "2001:db8::/64");
     host.answerWith("DELETE /api/bans/192.0.2.9",
                     problemReply(404, R"({"title": "There is no ban of 192.0.2.9."})"));
+    host.answerWith("DELETE /api/bans/192.0.2.1?dry_run=true",
+                    HttpReply{200,
+                              R"({"dry_run": true, "effects": [{"effect": "store", "subject": "bans"}]})",
+                              "application/json", false, false});
+    EXPECT_EQ(run({"bans", "lift", "192.0.2.1", "--dry-run"}).code, 7);
     const RunResult result = run({"bans", "lift", "192.0.2.9"});
     EXPECT_EQ(result.code, 3);
     EXPECT_NE(result.err.find("'veltctl bans list' lists"), std::string::npos) << result.err;

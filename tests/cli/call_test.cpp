@@ -22,6 +22,18 @@ TEST_F(CallTest, ParametersAreSentAsTheyAre) {
     EXPECT_EQ(sent(sftpSet).at(1), jsonOf(R"({"enable": false})"));
 }
 
+TEST_F(CallTest, AChangeTakesItsOptions) {
+    const std::string method = "POST /api/A/v2/set";
+    host.answerWith(method + "?dry_run=true&sessions=keep",
+                    HttpReply{200, R"({"dry_run": true, "effects": [{"effect": "start", "subject": "ftp"}]})",
+                              "application/json", false, false});
+    const RunResult plan = run({"call", "A", "2", "set", "--dry-run", "--keep-sessions"});
+    EXPECT_EQ(plan.code, 7);
+    EXPECT_EQ(plan.out, "  starts ftp\nNothing was changed: this was a dry run.\n");
+    host.answerWith(method + "?confirm_within=9", HttpReply{204, "", "", false, false});
+    EXPECT_EQ(run({"call", "A", "2", "set", "--confirm-within", "9"}).code, 0);
+}
+
 TEST_F(CallTest, AnAnswerMayBeAnyValue) {
     host.answerWith("POST /api/A/v2/b", HttpReply{200, "\"text\"", "application/json", false, false});
     EXPECT_EQ(run({"call", "A", "2", "b"}).out, "\"text\"\n");

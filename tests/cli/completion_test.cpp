@@ -123,8 +123,8 @@ TEST(CompletionTest, ValuesOfOptionsAreOffered) {
 TEST(CompletionTest, FilesAreOfferedWhereOneIsRead) {
     const TemporaryFolder folder;
     const std::string file = folder.write("set tings.json", "");
-    for (const Words& words : {Words{"import"}, Words{"chroot", "rules", "save"}, Words{"export", "--output"},
-                               Words{"--token-file"}}) {
+    for (const Words& words : {Words{"import"}, Words{"diff"}, Words{"chroot", "rules", "save"},
+                               Words{"export", "--output"}, Words{"--token-file"}}) {
         EXPECT_EQ(offered(with(words, {folder.path("set")})), Words{file});
     }
 }

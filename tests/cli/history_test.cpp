@@ -58,8 +58,32 @@ TEST_F(HistoryTest, TheOneThatWaitsIsConfirmed) {
     host.answerWith("POST /api/history/12/confirm", HttpReply{204, "", "", false, false});
     EXPECT_EQ(run({"confirm"}).out, "Change 12 stays.\n");
     EXPECT_EQ(jsonOf(run({"confirm", "12", "--json"}).out)["confirmed"], 12);
+    answer("POST /api/history/12/confirm?dry_run=true",
+           R"({"dry_run": true, "effects": [{"effect": "store", "subject": "history"}]})");
+    EXPECT_EQ(run({"confirm", "-n"}).out, "  stores the history\nNothing was changed: this was a dry run.\n");
     answer("GET /api/history?limit=100", R"({"changes": [], "next": null})");
     EXPECT_NE(run({"confirm"}).err.find("There is no change to confirm."), std::string::npos);
+}
+
+TEST_F(HistoryTest, TwoStatesAreCompared) {
+    answer("POST /api/diff", R"({"changes": [{"field": "/ftp/timeout", "from": 300, "to": 600}]})");
+    const RunResult result = run({"diff", "11", "12"});
+    EXPECT_EQ(result.code, 7);
+    EXPECT_EQ(result.out, "ftp/timeout: 300 -> 600\n");
+    EXPECT_EQ(sent("POST /api/diff").back(), jsonOf(R"({"from": 11, "to": 12})"));
+    EXPECT_EQ(jsonOf(run({"diff", "11", "--json"}).out)["changes"].size(), 1U);
+    EXPECT_EQ(sent("POST /api/diff").back(), jsonOf(R"({"from": 11, "to": "now"})"));
+    answer("POST /api/diff", R"({"changes": []})");
+    const RunResult same = run({"diff", "-", "now"}, R"({"ftp": {}})");
+    EXPECT_EQ(same.code, 0);
+    EXPECT_EQ(same.out, "No difference.\n");
+    EXPECT_EQ(sent("POST /api/diff").back(), jsonOf(R"({"from": {"ftp": {}}, "to": "now"})"));
+    EXPECT_EQ(run({"diff"}).code, 2);
+    EXPECT_EQ(run({"diff", folder.path("absent")}).code, 2);
+    answer("POST /api/diff", R"({"title": "There is no change 99 in the history."})", 404);
+    const RunResult unknown = run({"diff", "99"});
+    EXPECT_EQ(unknown.code, 3);
+    EXPECT_NE(unknown.err.find("'veltctl history' lists"), std::string::npos) << unknown.err;
 }
 
 } // namespace
@@ -76,4 +100,12 @@ TEST_F(RestartTest, SaysWhatBecameOfTheSessions) {
                     HttpReply{200, R"({"services": []})", "application/json", false, false});
     EXPECT_EQ(run({"restart", "--end-sessions"}).code, 0);
     EXPECT_EQ(run({"restart", "ftps"}).code, 2);
+    host.answerWith("POST /api/restart?sessions=keep&dry_run=true",
+                    HttpReply{200,
+                              R"({"dry_run": true, "effects": [{"effect": "hand over", "subject": "ftp"}]})",
+                              "application/json", false, false});
+    const RunResult plan = run({"restart", "--dry-run"});
+    EXPECT_EQ(plan.code, 7);
+    EXPECT_EQ(plan.out, "  hands the port of ftp over to a new daemon\n"
+                        "Nothing was changed: this was a dry run.\n");
 }

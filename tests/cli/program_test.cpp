@@ -1,6 +1,7 @@
 #include "tests/cli/cli_test.h"
 
 #include <algorithm>
+#include <set>
 
 using ProgramTest = CliTest;
 
@@ -56,6 +57,7 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "chroot users delete",
                             "chroot users list",
                             "confirm",
+                            "diff",
                             "doctor",
                             "events",
                             "export",
@@ -79,6 +81,37 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "tokens delete",
                             "tokens list",
                             "undo"}));
+}
+
+TEST_F(ProgramTest, WhatChangesSomethingHasADryRun) {
+    const std::set<std::string> readers{"",
+                                        "bans",
+                                        "bans list",
+                                        "chroot",
+                                        "chroot rules",
+                                        "chroot rules load",
+                                        "chroot users",
+                                        "chroot users list",
+                                        "diff",
+                                        "doctor",
+                                        "events",
+                                        "export",
+                                        "ftp",
+                                        "ftp get",
+                                        "history",
+                                        "log",
+                                        "security",
+                                        "security get",
+                                        "sftp",
+                                        "sftp get",
+                                        "shares",
+                                        "status",
+                                        "tokens",
+                                        "tokens list"};
+    for (const CommandDescription& command : describeCommands()) {
+        EXPECT_EQ(std::ranges::count(command.options, "--dry-run"), readers.contains(command.words) ? 0 : 1)
+            << command.words;
+    }
 }
 
 TEST_F(ProgramTest, BothTransportsCarryTheSameRequests) {

@@ -25,6 +25,25 @@ TEST_F(TokensTest, ATokenIsMadeAndStandsAloneOnTheOutput) {
     EXPECT_EQ(run({"tokens", "create"}).code, 2);
 }
 
+TEST_F(TokensTest, ADryRunOnlySaysWhatWouldBeDone) {
+    const HttpReply plan{200,
+                         R"({"dry_run": true, "changes": [], "effects": [
+                             {"effect": "store", "subject": "tokens"}, {"effect": "log", "subject": "Done."}]})",
+                         "application/json", false, false};
+    host.answerWith("POST /api/tokens?dry_run=true", plan);
+    host.answerWith("DELETE /api/tokens/t1?dry_run=true", plan);
+    for (const Words& words :
+         {Words{"tokens", "create", "desk", "--dry-run"}, Words{"tokens", "delete", "t1", "-n"}}) {
+        const RunResult result = run(words);
+        EXPECT_EQ(result.code, 7);
+        EXPECT_EQ(result.out, "  stores the tokens\n  writes into the log: Done.\n"
+                              "Nothing was changed: this was a dry run.\n");
+        Words asJson = words;
+        asJson.push_back("--json");
+        EXPECT_EQ(jsonOf(run(asJson).out)["effects"].size(), 2U);
+    }
+}
+
 TEST_F(TokensTest, ATokenIsMadeInvalid) {
     host.answerWith("DELETE /api/tokens/t%2F1", HttpReply{204, "", "", false, false});
     EXPECT_EQ(run({"tokens", "delete", "t/1"}).out, "Token t/1 is no longer valid.\n");

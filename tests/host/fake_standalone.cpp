@@ -241,9 +241,19 @@ std::string_view stepName(StepKind kind) {
         return "store";
     case StepKind::start:
         return "start";
+    case StepKind::logEntry:
+        return "log";
     default:
         return "stop";
     }
+}
+
+std::string sentenceOf(std::uint32_t /*event*/, const std::array<std::string, 4>& texts) {
+    std::string sentence;
+    for (const std::string& text : texts) {
+        sentence += (sentence.empty() || text.empty() ? "" : ": ") + text;
+    }
+    return sentence;
 }
 
 Result<> logEvent(int category, int level, unsigned event, const std::array<const char*, 4>& texts) {
@@ -255,7 +265,8 @@ Result<> logEvent(int category, int level, unsigned event, const std::array<cons
         entry.texts[i] = texts[i] == nullptr ? "" : texts[i];
     }
     FakeStandalone& fake = FakeStandalone::instance();
-    fake.audit.push_back(entry.texts[0] + ": " + entry.texts[1]);
+    const std::lock_guard lock(mutex);
+    fake.audit.push_back(sentenceOf(event, entry.texts));
     return fake.logFails ? Result<>(Error(fake.sentence)) : Result<>();
 }
 

@@ -27,7 +27,7 @@ struct FakeStandalone {
     std::vector<std::string> askedRestarts;  ///< "SERVICE POLICY" of each that was asked for
     bool restartFails = false;               ///< with `sentence`
     bool historyFails = false;               ///< with `sentence`
-    std::vector<std::string> audit;          ///< "WAY: WHAT" of the host's own log entries
+    std::vector<std::string> audit;          ///< the texts of the host's own log entries: "WAY: WHAT"
     bool settingsFail = false;               ///< those of the services cannot be read
     std::vector<velt::ServiceDown> down;     ///< services that are switched on and do not run
     bool startHelps = false;                 ///< and run once they are started

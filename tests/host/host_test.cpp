@@ -1,5 +1,7 @@
 #include "tests/host/host_test.h"
 
+#include "tests/host/fake_standalone.h"
+
 #include <cstdlib>
 #include <stdexcept>
 
@@ -40,6 +42,7 @@ void HostTest::start() {
     server->start(2);
     admin = "Authorization: Bearer " + makeToken("admin") + "\r\n";
     viewer = "Authorization: Bearer " + makeToken("viewer") + "\r\n";
+    FakeStandalone::instance().audit.clear(); // of the tokens
 }
 
 void HostTest::stop() {

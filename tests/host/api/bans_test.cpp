@@ -49,6 +49,19 @@ TEST_F(HostBans, AreLiftedByAdministratorsOnly) {
     EXPECT_EQ(again.json()["detail"], "There is no ban of 2001:db8::/64.");
 }
 
+TEST_F(HostBans, StayInADryRun) {
+    start();
+    ban("2001:db8::/64");
+    const Answer plan = ask("DELETE", "/api/bans/2001:db8::7?dry_run=true", admin);
+    EXPECT_EQ(plan.status, 200);
+    EXPECT_EQ(plan.json()["effects"][0]["subject"], "bans");
+    EXPECT_EQ(plan.json()["effects"][1]["subject"], "2001:db8::/64");
+    EXPECT_EQ(ask("DELETE", "/api/bans/192.0.2.1?dry_run=true", admin).status, 404);
+    EXPECT_EQ(ask("DELETE", "/api/bans/anna?dry_run=true", admin).status, 404);
+    EXPECT_EQ(ask("DELETE", "/api/bans/2001:db8::7?dryrun=true", admin).status, 400);
+    EXPECT_EQ(FakeStandalone::instance().bans.size(), 1U);
+}
+
 TEST_F(HostBans, ThatCannotBeReadAreAFailure) {
     start();
     FakeStandalone::instance().sentence = "Cannot open the list.";

@@ -84,7 +84,10 @@ TEST_F(HostHistory, AnUnconfirmedChangeIsTakenBack) {
 
 TEST_F(HostHistory, AConfirmedChangeStays) {
     ASSERT_EQ(setTimeOut(600, "?confirm_within=2").status, 200);
+    EXPECT_EQ(post("/api/history/1/confirm?dry_run=true").json()["effects"][0]["subject"], "history");
+    EXPECT_EQ(access.history[0].state, ChangeState::waiting);
     EXPECT_EQ(post("/api/history/1/confirm").status, 204);
+    EXPECT_EQ(access.audit.back(), "1");
     EXPECT_EQ(access.history[0].state, ChangeState::confirmed);
     EXPECT_EQ(post("/api/history/1/confirm").status, 409);
     EXPECT_EQ(setTimeOut(601, "?confirm_within=1").status, 200);

@@ -40,6 +40,46 @@ TEST_F(HostTokens, TokensAreListedMadeAndRemoved) {
     EXPECT_EQ(ask("DELETE", "/api/tokens/" + token["id"].asString(), admin).status, 404);
 }
 
+TEST_F(HostTokens, WhatBecomesOfTokensIsWrittenDownWithoutTheirSecret) {
+    start();
+    const Json::Value token = post("/api/tokens", R"({"name":"bench","role":"viewer"})").json();
+    const std::string id = token["id"].asString();
+    ASSERT_EQ(ask("DELETE", "/api/tokens/" + id, admin).status, 204);
+    ASSERT_EQ(ask("DELETE", "/api/tokens/" + id, admin).status, 404);
+    const FakeStandalone& fake = FakeStandalone::instance();
+    EXPECT_EQ(fake.audit, (std::vector<std::string>{"bench: viewer: " + id, "bench: viewer: " + id}));
+    EXPECT_EQ(fake.actor, "admin");
+    EXPECT_EQ(fake.address, "127.0.0.1");
+}
+
+TEST_F(HostTokens, AnEntryThatCannotBeWrittenTakesNothingBack) {
+    start();
+    FakeStandalone::instance().logFails = true;
+    FakeStandalone::instance().sentence = "The disk is full.";
+    EXPECT_EQ(post("/api/tokens", R"({"name":"bench","role":"viewer"})").status, 201);
+    EXPECT_TRUE(logged("The disk is full."));
+}
+
+TEST_F(HostTokens, ADryRunMakesAndDeletesNone) {
+    start();
+    const std::string bench = R"({"name":"bench","role":"viewer"})";
+    const Answer made = post("/api/tokens?dry_run=true", bench);
+    EXPECT_EQ(made.status, 200);
+    EXPECT_EQ(made.json()["effects"][0]["subject"], "tokens");
+    EXPECT_EQ(made.json()["effects"][1]["subject"], "bench: viewer: not known yet");
+    EXPECT_FALSE(made.json().isMember("token"));
+    EXPECT_EQ(post("/api/tokens?dry_run=true", R"({"name":"","role":"viewer"})").status, 422);
+    const std::string id = get("/api/tokens").json()["tokens"][1]["id"].asString();
+    EXPECT_EQ(ask("DELETE", "/api/tokens/" + id + "?dry_run=true", admin).json()["dry_run"], true);
+    EXPECT_EQ(ask("DELETE", "/api/tokens/absent?dry_run=true", admin).status, 404);
+    for (const char* query : {"?dry_run=maybe", "?sessions=keep"}) {
+        EXPECT_EQ(post(std::string("/api/tokens") + query, bench).status, 400);
+        EXPECT_EQ(ask("DELETE", "/api/tokens/" + id + query, admin).status, 400);
+    }
+    EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
+    EXPECT_TRUE(FakeStandalone::instance().audit.empty());
+}
+
 TEST_F(HostTokens, OnlyATokensOwnPathRemovesIt) {
     start();
     const std::string id = post("/api/tokens", R"({"name":"bench","role":"viewer"})").json()["id"].asString();
