@@ -4,6 +4,7 @@
 #include "cli/json_io.h"
 #include "cli/rule_change.h"
 #include "cli/text_table.h"
+#include "schema/settings_table.h"
 
 #include <CLI/CLI.hpp>
 
@@ -47,7 +48,7 @@ void listUsers(Context& context, const UserOptions& options) {
         parameters["substr"] = options.filter;
     }
     Json::Value answer = context.api.call({chrootApi, 1, "list"}, parameters);
-    const bool everybody = confinesAll(context.api.get(settingsPath));
+    const bool everybody = context.api.read({schema::security.api, 1, "get"})["user_chroot"] == true;
     answer["user_chroot"] = everybody;
     if (context.wroteJson(answer)) {
         return;

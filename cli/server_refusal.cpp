@@ -110,13 +110,14 @@ void addNotes(Failure& failure, const Json::Value& problem) {
             failure.note(note);
         }
     };
+    const std::string holder = textAt(problem, "holder");
     const Json::Value noErrors;
     const Json::Value& errors = problem["errors"];
-    for (const Json::Value& error : errors.isArray() ? errors : noErrors) {
+    // That a free port is expected goes without saying when somebody holds the other one.
+    for (const Json::Value& error : errors.isArray() && holder.empty() ? errors : noErrors) {
         const std::string fact = textAt(error, "field") + ": expected " + textAt(error, "expected");
         add(fact, fact);
     }
-    const std::string holder = textAt(problem, "holder");
     add(holder, "held by " + holder);
     if (problem["changed"] == false) {
         add("Nothing was changed.", "Nothing was changed.");

@@ -117,7 +117,7 @@ HttpResponse AllSettings::change(const Call& call, bool isPatch) {
     }
     const auto before = readSettingsDocument(table_, call.principal);
     if (!before) {
-        return problem(500, before.error().message + nothing, call.id);
+        return failedUnchanged(before.error().message, call.id);
     }
     const Json::Value wanted = isPatch ? patched(*before, *body) : *body;
     return store(*before, wanted, "settings", std::get<ChangeOptions>(options), call);
@@ -156,9 +156,8 @@ std::optional<HttpResponse> AllSettings::ask(const Json::Value& before, const Js
     for (const SettingsCall& each : callsFor(before, wanted)) {
         const Row* const row = table_.find(each.api, each.version, each.method);
         if (row == nullptr) {
-            return problem(500,
-                           "The module has no method " + each.method + " for " + each.section + "." + nothing,
-                           call.id);
+            return failedUnchanged("The module has no method " + each.method + " for " + each.section + ".",
+                                   call.id);
         }
         const Outcome outcome = callRow(*row, each.parameters, call.principal.actor, call.principal.address);
         if (outcome.kind != Outcome::Kind::success) {
@@ -167,7 +166,7 @@ std::optional<HttpResponse> AllSettings::ask(const Json::Value& before, const Js
     }
     const auto after = readSettingsDocument(table_, call.principal);
     if (!after) {
-        return problem(500, after.error().message + nothing, call.id);
+        return failedUnchanged(after.error().message, call.id);
     }
     const auto ignored = ignoredParts(wanted, *after);
     return ignored.empty() ? std::nullopt : std::optional(refused(ignored, call.id));

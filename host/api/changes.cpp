@@ -63,7 +63,7 @@ std::variant<ChangeReport, HttpResponse> Changes::make(const ChangeRequest& requ
     const auto before = readSettingsDocument(table_, call.principal);
     auto change = SettingsChange::begin(request.ports);
     if (!change) {
-        return problem(500, change.error().message + " Nothing was changed.", call.id);
+        return failedUnchanged(change.error().message, call.id);
     }
     if (auto refusal = ask()) {
         return std::move(*refusal);
@@ -86,7 +86,7 @@ std::optional<HttpResponse> Changes::preview(SettingsChange& change, const Chang
                                              ChangeReport& report) {
     const auto plan = change.plan(request.options.sessions);
     if (!plan) {
-        return problem(500, plan.error().message + " Nothing was changed.", request.call.id);
+        return failedUnchanged(plan.error().message, request.call.id);
     }
     report.steps = plan->steps;
     report.sessionsEnded = plan->sessionsEnded;
@@ -99,7 +99,7 @@ std::optional<HttpResponse> Changes::commit(SettingsChange& change, const Change
     if (request.options.confirmWithin && !report.changes.empty()) {
         const auto recorded = record(request, ChangeState::waiting, report);
         if (!recorded) {
-            return problem(500, recorded.error().message + " Nothing was changed.", request.call.id);
+            return failedUnchanged(recorded.error().message, request.call.id);
         }
     }
     const ChangeOutcome outcome = change.commit(request.options.sessions);

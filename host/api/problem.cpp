@@ -12,6 +12,14 @@ HttpResponse problem(int status, const std::string& detail, const std::string& r
     return problemWith(status, jsonObject({{"detail", detail}}), requestId);
 }
 
+HttpResponse failedUnchanged(const std::string& sentence, const std::string& requestId) {
+    return problemWith(500,
+                       jsonObject({{"title", "The operation failed"},
+                                   {"detail", sentence + " Nothing was changed."},
+                                   {"changed", false}}),
+                       requestId);
+}
+
 HttpResponse problemWith(int status, Json::Value members, const std::string& requestId) {
     members["status"] = status;
     if (!members.isMember("title")) {

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <array>
+#include <string_view>
 
 namespace velt::host {
 
@@ -32,6 +33,9 @@ constexpr std::array<Meaning, 5> meanings{{
     {1951, 409, "The SFTP port is taken", "portnum", freePort, true},
 }};
 
+constexpr const char* oneFreePort = "a port from 1 to 65535";
+constexpr const char* freePorts = "first and last port from 1024 to 65535, such as 55536:55899";
+
 constexpr Meaning cannotBe{0, 422, "The settings cannot be like this"};
 constexpr Meaning portInUse{0, 409, "A port is taken"};
 constexpr Meaning otherFailure{0, 500, "The operation failed"};
@@ -49,6 +53,10 @@ Meaning meaningOf(ErrorNumber error) {
     }
 }
 
+bool isOnePort(std::string_view field) {
+    return field == "portnum";
+}
+
 Meaning meaningOf(const Outcome& outcome) {
     const auto* const found = std::ranges::find(meanings, outcome.code, &Meaning::code);
     if (found == meanings.end()) {
@@ -56,7 +64,8 @@ Meaning meaningOf(const Outcome& outcome) {
     }
     // A port that nobody holds is none.
     return found->portTaken && outcome.platform.conflict.holder.empty()
-               ? Meaning{outcome.code, cannotBe.status, cannotBe.title, found->field, "ports from 1 to 65535"}
+               ? Meaning{outcome.code, cannotBe.status, cannotBe.title, found->field,
+                         isOnePort(found->field) ? oneFreePort : freePorts}
                : *found;
 }
 
@@ -77,14 +86,18 @@ std::string describe(const FieldError& error) {
 std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& meaning,
                      const std::vector<FieldError>& errors) {
     std::string detail;
-    append(detail, reasonIn(outcome.logLines));
-    for (const FieldError& error : errors) {
-        append(detail, describe(error));
-    }
-    if (meaning.portTaken && !outcome.platform.conflict.holder.empty()) {
-        append(detail, "Port " + std::to_string(outcome.platform.conflict.port) + " is held by " +
-                           outcome.platform.conflict.holder + ".");
+    if (meaning.portTaken) { // the module only says that there is a conflict
+        append(detail, outcome.platform.conflict.sentence);
+    } else if (*meaning.field != '\0' && meaning.status == cannotBe.status) {
+        append(detail, describe({meaning.field, meaning.expected}));
     } else {
+        const std::string reason = reasonIn(outcome.logLines);
+        // One that ends with places in the platform's sources is for its log.
+        const bool isForPeople = !reason.ends_with(']') || outcome.platform.sentence.empty();
+        append(detail, isForPeople ? reason : "");
+        for (const FieldError& error : errors) {
+            append(detail, describe(error));
+        }
         append(detail, outcome.platform.sentence);
     }
     if (!row.reads()) {

@@ -113,7 +113,10 @@ std::optional<PortConflict> conflictWithKnownService(const Question& question,
         const int last = std::min(question.range.last, service.lastPort);
         for (int port = first; port != 0 && port <= last; ++port) {
             if (!isOwnPort(question, claims, port)) {
-                return heldBy(port, "the service " + service.name + " of this server");
+                // Whether it listens or not.
+                const std::string owner = "the service " + service.name + " of this server";
+                return PortConflict{port, owner,
+                                    "Port " + std::to_string(port) + " is reserved for " + owner + "."};
             }
         }
     }

@@ -13,7 +13,8 @@ namespace velt {
 /// A port that a service cannot have.
 struct PortConflict {
     int port = 0;
-    std::string holder;   ///< in words: "the SFTP service", "nginx (process 812)"; "" when it is not a port
+    std::string holder;   ///< in words: "the SFTP service", "nginx (process 812)", "the service iscsi of this
+                          ///< server"; "" when it is not a port
     std::string sentence; ///< for people
 };
 

@@ -169,10 +169,10 @@ TEST_F(HostRefusal, aTakenPortNamesItsHolder) {
     done({"ftp", "set", "enable_ftp=on"});
     const UniqueFd other = listenOn(2300);
     const std::string holder = "system-host-tes (process 1)"; // as much of a name as the kernel keeps
-    expectFailure({"ftp", "set", "portnum=2300"}, 4, "held by " + holder);
+    expectFailure({"ftp", "set", "portnum=2300"}, 4, "taken by " + holder);
     expectFailure({"sftp", "set", "portnum=2300"}, 4, holder);
     expectFailure({"ftp", "set", "custom_port=2290:2310"}, 4, holder);
-    expectFailure({"ftp", "set", "portnum=2222"}, 4, "held by the SFTP service");
+    expectFailure({"ftp", "set", "portnum=2222"}, 4, "taken by the SFTP service");
     expectFailure({"sftp", "set", "portnum=2121"}, 4, "FTP");
     const std::string before = exported();
     const std::vector<std::tuple<std::string, std::string, int>> requests{

@@ -256,7 +256,7 @@ TEST_F(UnderSystemd, theHostNamesWhoHoldsAPort) {
             const AlicesListener hers(port);
             const std::string refusal =
                 refused({"sftp", "set", "enable=on", "portnum=" + std::to_string(port)});
-            EXPECT_NE(refusal.find("is held by sleep"), std::string::npos) << refusal;
+            EXPECT_NE(refusal.find("is taken by sleep"), std::string::npos) << refusal;
         }
     });
 }

@@ -185,6 +185,16 @@ TEST(ChangeSummaryTest, OfManyRulesTheFirstAreNamed) {
     EXPECT_TRUE(text.ends_with("user u19 /home and 180 more)")) << text;
 }
 
+TEST_F(HostSettings, WhatCannotBeReadIsSaidToHaveChangedNothing) {
+    platform.fail("VELTSFTPConfigGet");
+    access.sentence = "Cannot read sftp.conf.";
+    const Answer answer = patch(R"({"ftp":{"timeout":600}})");
+    EXPECT_EQ(answer.status, 500);
+    EXPECT_EQ(answer.json()["title"], "The operation failed");
+    EXPECT_EQ(answer.json()["detail"], "Cannot read sftp.conf. Nothing was changed.");
+    EXPECT_EQ(answer.json()["changed"], false);
+}
+
 TEST_F(HostSettings, ATakenPortIsAConflictOfItsField) {
     platform.takenPorts["web"] = {2222};
     access.conflict = {2222, "nginx (process 812)", ""};

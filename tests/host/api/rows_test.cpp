@@ -138,29 +138,33 @@ TEST_F(HostRows, AConflictNamesTheHolderOfThePort) {
               "The FTP port is taken"},
              {ftp + "3/set", range.c_str(), 40000, 1904, "The passive port range is taken"},
              {sftp + "set", R"({"enable":true,"portnum":2222})", 2222, 1951, "The SFTP port is taken"}}) {
-        access.conflict = {each.port, "nginx (process 812)", ""};
+        const std::string sentence =
+            "Port " + std::to_string(each.port) + " is taken by nginx (process 812).";
+        access.conflict = {each.port, "nginx (process 812)", sentence};
         const Answer answer = post(each.target, each.body);
         EXPECT_EQ(answer.status, 409);
         const Json::Value problem = answer.json();
         EXPECT_EQ(problem["code"], each.code);
         EXPECT_EQ(problem["title"], each.title);
         EXPECT_EQ(problem["holder"], "nginx (process 812)");
-        const std::string detail = problem["detail"].asString();
-        EXPECT_TRUE(detail.ends_with(" Port " + std::to_string(each.port) +
-                                     " is held by nginx (process 812). Nothing was changed."))
-            << detail;
+        EXPECT_EQ(problem["detail"], sentence + " Nothing was changed.");
     }
 }
 
-TEST_F(HostRows, APortThatNobodyHoldsIsRefusedInThePlatformsWords) {
+TEST_F(HostRows, APortThatNobodyHoldsIsNone) {
     platform.takenPorts["ssh"] = {0};
     access.sentence = "Port 0: expected a port from 1 to 65535.";
     const Answer answer = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":0})");
     EXPECT_EQ(answer.status, 422);
     EXPECT_EQ(answer.json()["errors"][0]["field"], "portnum");
     EXPECT_FALSE(answer.json().isMember("holder"));
-    EXPECT_EQ(answer.json()["detail"],
-              "Port conflict. Port 0: expected a port from 1 to 65535. Nothing was changed.");
+    EXPECT_EQ(answer.json()["detail"], "portnum: expected a port from 1 to 65535. Nothing was changed.");
+    const Answer range =
+        post(ftp + "3/set",
+             R"({"enable_ftp":true,"enable_ftps":true,"custom_port_range":true,"custom_port":"0:5"})");
+    EXPECT_EQ(range.json()["detail"],
+              "custom_port: expected first and last port from 1024 to 65535, such as 55536:55899. "
+              "Nothing was changed.");
 }
 
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {
@@ -179,6 +183,14 @@ TEST_F(HostRows, AFailedOperationTellsThePlatformsSentence) {
     EXPECT_EQ(answer.json()["code"], 1902);
     EXPECT_EQ(answer.json()["detail"],
               "Failed to get SFTP config. The file sftp.conf cannot be read: Permission denied.");
+}
+
+TEST_F(HostRows, PlacesInThePlatformsSourcesAreForTheLog) {
+    platform.fail("VELTFTPChrootRuleEnum");
+    access.sentence = "Cannot read chroot_rules, line 1.";
+    const Answer answer = get("/api/VELT.Core.FileServ.FTP.ChrootUser/v2/load");
+    EXPECT_EQ(answer.json()["detail"], access.sentence);
+    EXPECT_TRUE(logged("module: chroot:"));
 }
 
 TEST_F(HostRows, TheModulesLinesAreInTheHostsLogUnderTheRequestsId) {

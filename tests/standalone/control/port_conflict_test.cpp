@@ -63,7 +63,10 @@ protected:
         EXPECT_NE(IsPortConflict(service, first, last), 0) << service << " " << first << ":" << last;
         EXPECT_EQ(lastPortConflict().port, port);
         EXPECT_EQ(lastPortConflict().holder, holder);
-        EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) + " is taken by " + holder + ".");
+        const bool isReserved = holder.ends_with(" of this server");
+        EXPECT_EQ(lastErrorSentence(), "Port " + std::to_string(port) +
+                                           (isReserved ? " is reserved for " : " is taken by ") + holder +
+                                           ".");
     }
 
     static std::string thisProcess() {
