@@ -41,12 +41,6 @@ Result<> startIfOn(const Daemon& daemon) {
     return settings.enabled() ? followSettings(daemon) : Result<>();
 }
 
-Result<> reload(const Daemon& daemon) {
-    VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
-    const bool serves = settings.enabled() && isServing(daemonState(daemon));
-    return serves ? perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); }) : Result<>();
-}
-
 } // namespace
 
 Result<> startEnabledServices() {
@@ -56,13 +50,6 @@ Result<> startEnabledServices() {
 
 Result<> stopServices() {
     return forEachDaemon(stop);
-}
-
-Result<std::vector<ServiceSessions>> reloadServices(SessionPolicy policy) {
-    ServiceRequest request(policy);
-    const auto done = forEachDaemon(reload);
-    auto sessions = request.finish();
-    return done ? std::move(sessions) : done.error();
 }
 
 Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service) {

@@ -34,6 +34,12 @@ protected:
         ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     }
 
+    static Sessions restart() {
+        const auto sessions = restartServices(SessionPolicy::keep);
+        EXPECT_EQ(messageOf(sessions), "");
+        return sessions.valueOr({});
+    }
+
     static Sessions end(ServiceRequest& request) {
         const auto sessions = request.finish();
         EXPECT_EQ(messageOf(sessions), "");
@@ -222,7 +228,7 @@ TEST_F(ServiceRequestTest, APauseThatNothingFollowsIsAPause) {
     EXPECT_EQ(serviceState("sftp").state, RunState::paused);
 }
 
-TEST_F(ServiceRequestTest, AReloadReplacesWhatIsStartedOtherwiseNow) {
+TEST_F(ServiceRequestTest, ARestartReplacesWhatIsStartedOtherwiseNow) {
     storeSftp(true);
     ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
     Client ftp(ftpPort_);
@@ -230,21 +236,22 @@ TEST_F(ServiceRequestTest, AReloadReplacesWhatIsStartedOtherwiseNow) {
     ASSERT_TRUE(ftp.isServed() && sftp.isServed());
     const ProcessId ftpDaemonBefore = daemonOf("ftpd");
     const ProcessId sftpDaemonBefore = daemonOf("sftp");
-    EXPECT_EQ(reloadServices().valueOr({{"failed", 0, 0}}), Sessions());
+    EXPECT_EQ(restart(), Sessions());
     EXPECT_EQ(daemonOf("ftpd"), ftpDaemonBefore);
     planDouble().ftpOptions = {"--share", "--delay", "1"};
     planDouble().sftpOptions = {"--delay", "1"};
     planDouble().takesRights = true;
-    EXPECT_EQ(reloadServices().valueOr({}), (Sessions{{"ftp", 0, 1}, {"sftp", 0, 1}}));
+    EXPECT_EQ(restart(), (Sessions{{"ftp", 0, 1}, {"sftp", 0, 1}}));
     EXPECT_NE(daemonOf("ftpd"), ftpDaemonBefore);
     EXPECT_NE(daemonOf("sftp"), sftpDaemonBefore);
     EXPECT_TRUE(ftp.isServed() && sftp.isServed());
 }
 
-TEST_F(ServiceRequestTest, AReloadStartsNothing) {
+TEST_F(ServiceRequestTest, ARestartStartsWhatIsOnAlone) {
     ASSERT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
-    EXPECT_EQ(reloadServices().valueOr({{"failed", 0, 0}}), Sessions());
-    EXPECT_FALSE(accepts(ftpPort_));
+    EXPECT_EQ(restart(), Sessions());
+    EXPECT_TRUE(accepts(ftpPort_));
+    EXPECT_FALSE(accepts(sftpPort_));
 }
 
 TEST_F(ServiceRequestTest, IsThatOfItsThread) {
