@@ -39,8 +39,7 @@
 // The calling thread's last error in a sentence.
 #include "standalone/contract/last_error.h"
 
-// Listing effects instead of doing them, or failing them; hearing which were done, with what result and in
-// what time.
+// Listing effects instead of doing them, or failing them.
 #include "standalone/core/effects.h"
 
 #endif

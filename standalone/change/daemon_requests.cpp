@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <utility>
 
 namespace velt {
 
@@ -22,11 +23,16 @@ Result<> checkWish(const Daemon& daemon, bool start) {
 } // namespace
 
 DaemonRequests::DaemonRequests() {
-    setEffectHook([this](Effect effect, std::string_view subject) { return decide(effect, subject); });
+    outer_ =
+        setEffectHook([this](Effect effect, std::string_view subject) { return decide(effect, subject); });
 }
 
 DaemonRequests::~DaemonRequests() {
-    setEffectHook({});
+    setEffectHook(std::move(outer_));
+}
+
+EffectDecision DaemonRequests::leave(Effect effect, std::string_view subject) const {
+    return outer_ ? outer_(effect, subject) : std::nullopt;
 }
 
 EffectDecision DaemonRequests::decide(Effect effect, std::string_view subject) {
@@ -45,9 +51,9 @@ EffectDecision DaemonRequests::decide(Effect effect, std::string_view subject) {
             }
             return Result<>();
         }
-        return std::nullopt;
+        return leave(effect, subject);
     default:
-        return std::nullopt;
+        return leave(effect, subject);
     }
 }
 

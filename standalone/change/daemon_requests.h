@@ -13,7 +13,7 @@ namespace velt {
 
 /// While it lives, the effects of its thread that stagings cannot hold are not done but noted: starts, stops,
 /// the firewall, and keys and certificates that are made when a daemon needs them. A start or stop that would
-/// fail fails. Stays on its thread.
+/// fail fails. All others are left to the hook that the thread had before. Stays on its thread.
 class DaemonRequests {
 public:
     struct Wish {
@@ -37,8 +37,10 @@ public:
 
 private:
     EffectDecision decide(Effect effect, std::string_view subject);
+    EffectDecision leave(Effect effect, std::string_view subject) const;
     Result<> wish(std::string_view service, bool start);
 
+    EffectHook outer_;
     std::vector<Wish> wishes_;
     std::vector<std::string> missingKeys_;
     bool firewall_ = false;

@@ -12,31 +12,6 @@ EffectHook& threadHook() {
     return hook;
 }
 
-EffectReport& threadReport() {
-    thread_local EffectReport report;
-    return report;
-}
-
-Result<> actAndReport(Effect effect, std::string_view subject, const std::function<Result<>()>& act) {
-    // A copy, since the effect may set another one while it runs.
-    const EffectReport report = threadReport();
-    if (!report)
-        return act();
-    const auto start = std::chrono::steady_clock::now();
-    const auto tell = [&](const Result<>& outcome) {
-        report(effect, subject, outcome, std::chrono::steady_clock::now() - start);
-    };
-    try {
-        Result<> outcome = act();
-        tell(outcome);
-        return outcome;
-    } catch (...) {
-        // Part of it may have been done.
-        tell(Error("Unexpected exception."));
-        throw;
-    }
-}
-
 } // namespace
 
 std::string_view effectName(Effect effect) {
@@ -50,15 +25,11 @@ Result<> perform(Effect effect, std::string_view subject, const std::function<Re
     // A copy, since the hook may replace itself while it runs.
     const EffectHook hook = threadHook();
     const EffectDecision decision = hook ? hook(effect, subject) : std::nullopt;
-    return decision ? *decision : actAndReport(effect, subject, act);
+    return decision ? *decision : act();
 }
 
-void setEffectHook(EffectHook hook) {
-    threadHook() = std::move(hook);
-}
-
-void setEffectReport(EffectReport report) {
-    threadReport() = std::move(report);
+EffectHook setEffectHook(EffectHook hook) {
+    return std::exchange(threadHook(), std::move(hook));
 }
 
 } // namespace velt
