@@ -18,6 +18,7 @@
 #include <optional>
 #include <thread>
 #include <utility>
+#include <vector>
 
 namespace velt {
 namespace {
@@ -27,6 +28,7 @@ using std::chrono::milliseconds;
 // An end that takes longer than this is taken out of the supervisor's hands.
 constexpr milliseconds endLimit{6000};
 constexpr milliseconds farewellLimit{500};
+constexpr milliseconds releaseLimit{300};
 
 std::unique_ptr<SupervisorLauncher> launcherFor(const Daemon& daemon) {
     if (systemdKeepsSupervisors()) {
@@ -48,6 +50,19 @@ bool isGoneSoon(const ProcessId& process) {
     return true;
 }
 
+/// A session that has just begun holds its daemon's listener for a moment, even after the daemon's end.
+Result<> awaitPorts(const std::vector<int>& ports, pid_t own) {
+    const auto deadline = std::chrono::steady_clock::now() + releaseLimit;
+    for (;;) {
+        auto free = probePorts(ports, own);
+        if (free || free.error().number != ErrorNumber::portTaken ||
+            std::chrono::steady_clock::now() >= deadline) {
+            return free;
+        }
+        std::this_thread::sleep_for(milliseconds(2));
+    }
+}
+
 } // namespace
 
 SupervisedDaemon::SupervisedDaemon(const Daemon& daemon) : SupervisedDaemon(daemon, launcherFor(daemon)) {}
@@ -63,7 +78,7 @@ Result<SessionCount> SupervisedDaemon::start(const DaemonOrder& order, bool endS
     if (unchanged && !endSessions) {
         return SessionCount{};
     }
-    VELT_RETURN_IF_ERROR(probePorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0));
+    VELT_RETURN_IF_ERROR(awaitPorts(order.ports, isAlive(now.daemon) ? now.daemon.pid : 0));
     const auto started = supervised ? handOver(folder, now.supervisor, {Command::start, order, endSessions})
                                     : launch(folder, order);
     return started ? started : failure("does not start", started.error().message);

@@ -36,6 +36,16 @@ TEST_F(ServicesTest, UnknownNamesFailWithASentence) {
     }
 }
 
+TEST_F(ServicesTest, APortThatIsJustBeingGivenUpIsWaitedFor) {
+    auto other = std::make_unique<Listener>(ftpPort_);
+    std::thread former([&other] {
+        std::this_thread::sleep_for(milliseconds(50));
+        other.reset();
+    });
+    EXPECT_EQ(messageOf(SupervisedDaemon(ftpDaemon).start(testOrder(ftpPort_, "next"))), "");
+    former.join();
+}
+
 TEST_F(ServicesTest, EnabledMeansTheStoredFlags) {
     for (const int flags : {0, plain, tls, plain | tls, 4}) {
         storeFtp(flags);
