@@ -19,6 +19,7 @@ enum class AuditEvent : unsigned {
     tokenMade = 0x11BF0006,
     tokenDeleted = 0x11BF0007,
     restarted = 0x11BF0008,
+    takenBackInPart = 0x11BF0009,
 };
 
 struct AuditEntry {

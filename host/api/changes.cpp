@@ -1,6 +1,7 @@
 #include "host/api/changes.h"
 
 #include "base/json_value.h"
+#include "base/text.h"
 #include "host/api/audit.h"
 #include "host/api/change_summary.h"
 #include "host/api/problem.h"
@@ -17,7 +18,7 @@ namespace {
 
 /// A change that the platform could not do, though the module accepted it.
 HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId) {
-    const bool taken = outcome.failure->number == ErrorNumber::portTaken;
+    const bool taken = outcome.undone && outcome.failure->number == ErrorNumber::portTaken;
     const std::string extent = outcome.undone ? " All is as it was before." : "";
     return problemWith(taken ? 409 : 500,
                        jsonObject({{"title", outcome.undone ? "The change was taken back"
@@ -105,6 +106,7 @@ std::optional<HttpResponse> Changes::commit(SettingsChange& change, const Change
     const ChangeOutcome outcome = change.commit(request.options.sessions);
     report.steps = outcome.steps;
     report.sessionsEnded = outcome.sessionsEnded;
+    report.warnings = outcome.warnings;
     if (outcome.failure) {
         noteFailure(outcome, request, report);
         return notDone(outcome, request.call.id);
@@ -126,6 +128,8 @@ void Changes::noteFailure(const ChangeOutcome& outcome, const ChangeRequest& req
     }
     if (!outcome.undone) {
         revision_.advance();
+        const std::string reason(trimmedEnd(outcome.failure->message, "."));
+        writeAudit({AuditEvent::takenBackInPart, {request.way, reason}}, log_, request.call);
     }
 }
 

@@ -26,7 +26,8 @@ HttpResponse answerOf(const ChangeReport& report, HttpResponse ofModule) {
         return jsonResponse(200, toObject(report));
     }
     const bool hasRoom = ofModule.status == 204;
-    return hasRoom && !report.down.empty() ? jsonResponse(200, toObject(report)) : std::move(ofModule);
+    const bool hasMore = !report.down.empty() || !report.warnings.empty();
+    return hasRoom && hasMore ? jsonResponse(200, toObject(report)) : std::move(ofModule);
 }
 
 } // namespace

@@ -30,15 +30,6 @@ constexpr std::array storedFiles{
     StoredFile{paths::systemInformation, "system information"},
 };
 
-/// "ftp settings"; "run key of ftpd" for one below the folder of run keys.
-std::string subjectOf(const StagedFile& file) {
-    const auto* const known = std::ranges::find(storedFiles, file.name, &StoredFile::name);
-    if (known != storedFiles.end()) {
-        return std::string(known->subject);
-    }
-    return "run key of " + file.name.substr(file.name.rfind('/') + 1);
-}
-
 /// Whether the daemon listens on a port that the other is to have.
 bool isInTheWay(const Daemon& daemon, const Daemon& other) {
     const auto wanted = other.settings();
@@ -196,13 +187,21 @@ ProgramStep journalStep(const SystemEvent& event) {
 
 } // namespace
 
+std::string subjectOf(const StagedFile& file) {
+    const auto* const known = std::ranges::find(storedFiles, file.name, &StoredFile::name);
+    if (known != storedFiles.end()) {
+        return std::string(known->subject);
+    }
+    return "run key of " + file.name.substr(file.name.rfind('/') + 1);
+}
+
 std::vector<ProgramStep> programOf(const StagedRequest& request) {
     std::vector<ProgramStep> program;
     for (const StagedFile& file : request.files) {
         program.push_back(storeStep(file));
     }
-    for (const std::string& keys : request.missingKeys) {
-        program.push_back({ChangeStep{StepKind::store, keys}, {}}); // its daemon's start makes it
+    for (const std::string& file : request.madeByStarts) {
+        program.push_back({ChangeStep{StepKind::store, file}, {}});
     }
     addDaemonSteps(request, program);
     const bool concerned =

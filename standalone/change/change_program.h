@@ -22,8 +22,8 @@ using OpenPorts = std::vector<VELT_FTP_PORT_RANGE>;
 struct StagedRequest {
     std::vector<StagedFile> files;
     std::vector<DaemonRequests::Wish> wishes;
-    std::vector<std::string> missingKeys;
-    bool firewall = false; ///< it was to be loaded
+    std::vector<std::string> madeByStarts; ///< files that a start makes where they are missing
+    bool firewall = false;                 ///< it was to be loaded
     OpenPorts openBefore;
     OpenPorts openAfter;
     std::vector<HeldJournal::Item> journal;
@@ -38,6 +38,9 @@ struct ProgramStep {
         act{};             ///< gives the sessions that it ended; empty: it comes with another step
     int sessionsEnded = 0; ///< as it looks now
 };
+
+/// "ftp settings"; "run key of ftpd" for one below the folder of run keys.
+std::string subjectOf(const StagedFile& file);
 
 /// The steps in order, as things stand now.
 std::vector<ProgramStep> programOf(const StagedRequest& request);

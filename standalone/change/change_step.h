@@ -15,7 +15,7 @@ enum class StepKind {
     pause,       ///< a daemon stops listening; its sessions go on
     stop,        ///< a daemon and its sessions
     endSessions, ///< of a daemon that goes on
-    openPort,    ///< "21", or "55536:55899"
+    openPort,    ///< "21", or "55536-55899"
     closePort,   ///< the same
     event,       ///< a system event: "ftpd stop"
     logEntry,    ///< an entry of the administrator log: its sentence

@@ -1,20 +1,35 @@
 #include "standalone/change/run_change.h"
 
-#include "standalone/change/unfinished_change.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/service_firewall.h"
 #include "standalone/control/supervised_daemon.h"
+#include "standalone/core/effects.h"
+#include "standalone/core/error_number.h"
+#include "standalone/core/unfinished_change.h"
+#include "standalone/firewall/firewall_settings.h"
+#include "standalone/firewall/firewall_table.h"
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <map>
+#include <optional>
+#include <string_view>
 #include <utility>
 
 namespace velt {
 
 namespace {
 
+constexpr std::string_view noteSubject = "note of the change";
+
 using FormerStates = std::map<const Daemon*, RunState>;
+
+void keepFirst(Result<>& outcome, Result<> next) {
+    if (outcome) {
+        outcome = std::move(next);
+    }
+}
 
 FormerStates statesOf(const std::vector<DaemonRequests::Wish>& wishes) {
     FormerStates states;
@@ -25,44 +40,121 @@ FormerStates statesOf(const std::vector<DaemonRequests::Wish>& wishes) {
 }
 
 Result<> bringBack(const Daemon& daemon, RunState former) {
-    switch (former) {
-    case RunState::running:
-        return startDaemon(daemon);
-    case RunState::paused:
-        return pauseDaemon(daemon);
-    default:
-        return stopDaemon(daemon);
-    }
+    const bool starts = former == RunState::running;
+    return perform(starts ? Effect::start : Effect::stop, daemon.name, [&] {
+        if (starts) {
+            return startDaemon(daemon);
+        }
+        return former == RunState::paused ? pauseDaemon(daemon) : stopDaemon(daemon);
+    });
 }
 
-/// Everything as it was. Goes on after a failure, and returns the first.
-Result<> undo(const StagedRequest& request, const FormerStates& former) {
+/// Of the daemons that wait for a port, one that can goes out of the way. False when there is none.
+bool makeRoom(const FormerStates& waiting) {
+    return std::ranges::any_of(waiting, [](const auto& each) {
+        const Daemon& daemon = *each.first;
+        return daemon.canPause && isServing(daemonState(daemon)) &&
+               perform(Effect::stop, daemon.name, [&] { return pauseDaemon(daemon); });
+    });
+}
+
+/// One may still hold the port that another had, so those that find it taken are tried again after the
+/// others. Goes on after another failure, and returns the first.
+Result<> bringBackDaemons(FormerStates former) {
     Result<> outcome;
-    // Without the lock, too: better so than not at all. Not held while daemons start.
-    auto lock = std::optional(StateLock::take());
-    const auto note = [&outcome](Result<> done) {
-        if (!done && outcome) {
-            outcome = std::move(done);
+    while (!former.empty()) {
+        FormerStates waiting;
+        Result<> taken;
+        for (const auto& [daemon, state] : former) {
+            auto done = bringBack(*daemon, state);
+            if (!done && done.error().number == ErrorNumber::portTaken) {
+                waiting[daemon] = state;
+                keepFirst(taken, std::move(done));
+            } else {
+                keepFirst(outcome, std::move(done));
+            }
         }
-    };
-    for (const StagedFile& file : request.files) {
-        note(restore(file));
+        if (waiting.size() == former.size() && !makeRoom(waiting)) {
+            keepFirst(outcome, std::move(taken));
+            break;
+        }
+        former = std::move(waiting);
     }
-    if (outcome) {
-        note(forgetChange()); // else the next start of this system tries once more
-    }
-    lock.reset();
-    for (const auto& [daemon, state] : former) {
-        note(bringBack(*daemon, state));
-    }
-    followWithFirewall();
     return outcome;
 }
 
-ChangeOutcome failed(const StagedRequest& request, const FormerStates& former, Error why) {
-    const auto undone = undo(request, former);
+/// The change on the disk, to be undone after a crash. Where nothing is stored there is nothing to note.
+Result<> noteIfStored(const std::vector<StagedFile>& files) {
+    return files.empty() ? Result<>()
+                         : perform(Effect::store, noteSubject, [&] { return noteChange(files); });
+}
+
+Result<> forget() {
+    return perform(Effect::store, noteSubject, forgetChange);
+}
+
+Result<> bringBackFiles(const std::vector<StagedFile>& files) {
+    Result<> outcome;
+    // Without the lock, too: better so than not at all. Not held while daemons start.
+    const auto lock = std::optional(StateLock::take());
+    for (const StagedFile& file : files) {
+        keepFirst(outcome, perform(Effect::store, subjectOf(file), [&] { return restore(file); }));
+    }
+    return outcome;
+}
+
+bool has(const std::vector<ProgramStep>& program, StepKind kind) {
+    return std::ranges::any_of(program,
+                               [&](const ProgramStep& each) { return each.step && each.step->kind == kind; });
+}
+
+bool movesPorts(const std::vector<ProgramStep>& program) {
+    return has(program, StepKind::openPort) || has(program, StepKind::closePort);
+}
+
+/// Whether a port is closed to everybody as long as our rules do not open it. Settings that cannot be read
+/// tell nothing of the rules in force.
+bool rulesCloseOthers() {
+    const auto firewall = loadFirewallSettings();
+    return !firewall || firewall->mode == FirewallMode::drop;
+}
+
+/// A port that stays closed makes the change one that is not done.
+Result<> movePorts(const StagedRequest& request, const std::vector<ProgramStep>& program,
+                   ChangeOutcome& outcome) {
+    if (!request.firewall && !movesPorts(program)) {
+        return {};
+    }
+    auto loaded = openServicePorts();
+    if (!loaded && !(has(program, StepKind::openPort) && rulesCloseOthers())) {
+        outcome.warnings.push_back(loaded.error().message);
+        return {};
+    }
+    return loaded;
+}
+
+/// Everything as it was. Goes on after a failure, and returns the first; then the note stays, and the next
+/// start of this system tries once more.
+Result<> undo(const StagedRequest& request, const std::vector<ProgramStep>& program,
+              const FormerStates& former, bool rulesMoved) {
+    Result<> outcome = bringBackFiles(request.files);
+    keepFirst(outcome, bringBackDaemons(former));
+    auto followed = movesPorts(program) ? openServicePorts() : Result<>();
+    if (rulesMoved) { // else those in force are the former ones
+        keepFirst(outcome, std::move(followed));
+    }
+    if (outcome) {
+        return forget();
+    }
+    return outcome;
+}
+
+ChangeOutcome failed(Error why, const Result<>& undone, const std::vector<StagedFile>& files) {
     if (!undone) {
         why.message += " Not all could be set back to what it was: " + undone.error().message;
+        if (files.empty()) {
+            (void)noteChange(files); // the note tells of more than the files
+        }
         ::syslog(LOG_ERR, "%s", why.message.c_str());
     }
     return {{}, std::move(why), bool(undone)};
@@ -83,35 +175,40 @@ Result<> doSteps(const std::vector<ProgramStep>& program, std::optional<StateLoc
     return {};
 }
 
-void writeDown(const std::vector<HeldJournal::Item>& items) {
+Result<> writeDown(const std::vector<HeldJournal::Item>& items) {
     HeldJournal journal;
     for (const HeldJournal::Item& item : items) {
         holdBack(item);
     }
-    journal.release();
+    return journal.release();
 }
 
 } // namespace
 
+Result<> checkPorts(const std::vector<ProgramStep>& program) {
+    return has(program, StepKind::openPort) ? checkFirewallRules(firewallNeeds) : Result<>();
+}
+
 ChangeOutcome runChange(const StagedRequest& request, const std::vector<ProgramStep>& program,
                         StateLock lock) {
+    const ChangeAtWork atWork;
     ChangeOutcome outcome;
     const FormerStates former = statesOf(request.wishes);
-    const auto noted = request.files.empty() ? Result<>() : noteChange(request.files);
-    if (!noted) {
+    if (const auto noted = noteIfStored(request.files); !noted) {
         (void)forgetChange(); // it may be there all the same, for the next start to go by
         return {{}, noted.error()};
     }
-    if (auto done = doSteps(program, std::move(lock), outcome); !done) {
-        return failed(request, former, std::move(done.error()));
+    const auto followed = doSteps(program, std::move(lock), outcome);
+    const auto moved = followed ? movePorts(request, program, outcome) : Result<>();
+    const auto done = followed && moved ? forget() : Result<>();
+    for (const Result<>* each : {&followed, &moved, &done}) {
+        if (!*each) {
+            return failed(each->error(), undo(request, program, former, bool(moved)), request.files);
+        }
     }
-    if (request.firewall) {
-        followWithFirewall();
+    if (const auto written = writeDown(request.journal); !written) {
+        outcome.warnings.push_back(written.error().message);
     }
-    if (const auto forgotten = forgetChange(); !forgotten) {
-        return failed(request, former, forgotten.error());
-    }
-    writeDown(request.journal);
     return outcome;
 }
 

@@ -9,6 +9,9 @@
 
 namespace velt {
 
+/// Whether the firewall will take the ports that the change opens. To be called while it is staged.
+Result<> checkPorts(const std::vector<ProgramStep>& program);
+
 /// Does the steps one after the other, and writes down what was held back. Gives the lock up when the files
 /// are stored: starts take long, and daemons report failed logins under it. After a failure the files are as
 /// they were, and the daemons run as they did; where that fails as well, the failure says so.

@@ -1,10 +1,13 @@
 #include "standalone/change/settings_change.h"
 
+#include "base/file.h"
 #include "standalone/change/change_program.h"
 #include "standalone/change/run_change.h"
-#include "standalone/change/unfinished_change.h"
+#include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_lock.h"
+#include "standalone/core/state_root.h"
+#include "standalone/core/unfinished_change.h"
 #include "standalone/settings/lost_rights.h"
 #include "standalone/settings/settings.h"
 
@@ -45,6 +48,11 @@ bool changesRules(const std::vector<StagedFile>& files) {
     return std::ranges::find(files, paths::chrootRules, &StagedFile::name) != files.end();
 }
 
+bool startsFtp(const std::vector<DaemonRequests::Wish>& wishes) {
+    return std::ranges::any_of(
+        wishes, [](const DaemonRequests::Wish& wish) { return wish.start && wish.daemon == &ftpDaemon; });
+}
+
 class StagedChange final : public SettingsChange {
 public:
     StagedChange(Former former, std::unique_ptr<Staging> staging)
@@ -52,8 +60,10 @@ public:
 
     Result<ChangeOutcome> plan(SessionPolicy policy) override {
         VELT_ASSIGN_OR_RETURN(const auto request, collect(policy));
+        const auto program = programOf(request);
+        VELT_RETURN_IF_ERROR(checkPorts(program));
         ChangeOutcome outcome;
-        for (const ProgramStep& each : programOf(request)) {
+        for (const ProgramStep& each : program) {
             if (each.step) {
                 outcome.steps.push_back(*each.step);
             }
@@ -64,11 +74,11 @@ public:
 
     ChangeOutcome commit(SessionPolicy policy) override {
         const auto request = collect(policy);
-        if (!request) {
+        const auto program = request ? programOf(*request) : std::vector<ProgramStep>();
+        if (const auto checked = request ? checkPorts(program) : Result<>(request.error()); !checked) {
             staging_.reset();
-            return {{}, request.error()};
+            return {{}, checked.error()};
         }
-        const auto program = programOf(*request);
         StateLock lock = std::move(staging_->lock);
         staging_.reset();
         return runChange(*request, program, std::move(lock));
@@ -86,7 +96,10 @@ private:
         StagedRequest request;
         VELT_ASSIGN_OR_RETURN(request.files, staging_->files.changes());
         request.wishes = staging_->requests.wishes();
-        request.missingKeys = staging_->requests.missingKeys();
+        request.madeByStarts = staging_->requests.missingKeys();
+        if (startsFtp(request.wishes) && !fileExists(statePath(paths::chrootRules))) {
+            request.madeByStarts.push_back("chroot rules");
+        }
         request.firewall = staging_->requests.firewall();
         request.openBefore = former_.openPorts;
         VELT_ASSIGN_OR_RETURN(request.openAfter, openPorts());
@@ -100,10 +113,38 @@ private:
     std::unique_ptr<Staging> staging_;
 };
 
+Result<> restoreAll(const std::vector<StagedFile>& files) {
+    for (const StagedFile& file : files) {
+        VELT_RETURN_IF_ERROR(restore(file));
+    }
+    return {};
+}
+
+bool isRestored(const StagedFile& file) {
+    const auto now = readOptionalFile(placeBelowRoot(file.name));
+    return now && *now == file.before;
+}
+
+/// A change must not begin with settings that are half of another one.
+Result<> settleFormerChange() {
+    if (!changeWasLeft()) {
+        return {};
+    }
+    VELT_ASSIGN_OR_RETURN(const auto files, unfinishedChange());
+    if (std::ranges::all_of(files, isRestored)) {
+        return {};
+    }
+    VELT_RETURN_IF_ERROR(restoreAll(files));
+    return Error(ErrorNumber::store,
+                 "An earlier change could be taken back only in part. Its settings are taken "
+                 "back now: look at them, and try again.");
+}
+
 } // namespace
 
 Result<std::unique_ptr<SettingsChange>> SettingsChange::begin(const IntendedPorts& ports) {
     VELT_ASSIGN_OR_RETURN(auto lock, StateLock::take());
+    VELT_RETURN_IF_ERROR(settleFormerChange());
     Former former = readFormer();
     VELT_ASSIGN_OR_RETURN(auto files, StagedFiles::begin());
     auto staging = std::make_unique<Staging>(std::move(lock), std::move(files), ports);
@@ -114,9 +155,7 @@ Result<std::unique_ptr<SettingsChange>> SettingsChange::begin(const IntendedPort
 Result<bool> undoUnfinishedChange() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     VELT_ASSIGN_OR_RETURN(const auto files, unfinishedChange());
-    for (const StagedFile& file : files) {
-        VELT_RETURN_IF_ERROR(restore(file));
-    }
+    VELT_RETURN_IF_ERROR(restoreAll(files));
     VELT_RETURN_IF_ERROR(forgetChange());
     return !files.empty();
 }

@@ -132,4 +132,17 @@ Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeed
     return off ? removeRules(script) : replaceRules(firewall, script, needs);
 }
 
+Result<> checkFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds) {
+    VELT_ASSIGN_OR_RETURN(const bool allowed, mayTouchRules());
+    if (!allowed) {
+        return {};
+    }
+    VELT_ASSIGN_OR_RETURN(const auto firewall, loadFirewallSettings());
+    if (firewall.mode != FirewallMode::drop) {
+        return {};
+    }
+    VELT_ASSIGN_OR_RETURN(const auto needs, askNeeds());
+    return checkAdministration(firewall, needs);
+}
+
 } // namespace velt

@@ -41,6 +41,10 @@ std::optional<AdministrationPort> firstClosed(const std::vector<AdministrationPo
 /// for under the StateLock, and only when rules are to be made. Safe from all threads and processes.
 Result<> loadFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds);
 
+/// Fails where loadFirewallRules would, as far as that can be told without loading: settings that cannot be
+/// read, or rules that would lock the administrator out. For one who holds the StateLock.
+Result<> checkFirewallRules(const std::function<Result<FirewallNeeds>()>& askNeeds);
+
 } // namespace velt
 
 #endif

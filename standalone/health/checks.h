@@ -13,6 +13,9 @@ using TimePoint = std::chrono::system_clock::time_point;
 /// Enabled services that are down or run with former settings, with the reason.
 Findings serviceFindings();
 
+/// A change that failed and could not be taken back, or not wholly.
+Findings changeFindings();
+
 /// Services that run, and do not greet or take up TLS as their clients expect, or serve a certificate other
 /// than the stored one.
 Findings greetingFindings();

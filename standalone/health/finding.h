@@ -20,7 +20,8 @@ std::string_view severityName(Severity severity);
 struct Finding {
     std::string id; ///< stable, for programs: "certificate-key-mismatch"
     Severity severity = Severity::notice;
-    std::string subject;  ///< what it is about: "ftp", "sftp", "firewall", "shares", "chroot", "host"
+    std::string subject;  ///< what it is about: "ftp", "sftp", "settings", "firewall", "shares", "chroot",
+                          ///< "host"
     std::string sentence; ///< for people
     std::string mend;     ///< the command that mends it, or what to do before that command
 

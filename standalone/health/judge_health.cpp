@@ -20,6 +20,7 @@ Finding failedCheck(const std::exception& error) {
 Findings judgeHealth() {
     using Check = Findings (*)();
     static constexpr std::array checks{
+        Check{changeFindings},
         Check{serviceFindings},
         Check{greetingFindings},
         Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},

@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 32> entries{{
+constexpr std::array<CatalogueEntry, 33> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -42,6 +42,7 @@ constexpr std::array<CatalogueEntry, 32> entries{{
     {0x11BF0006, "A token with the role %2 was made for \"%1\"; its id is %3."},
     {0x11BF0007, "The token %3 with the role %2, made for \"%1\", was deleted."},
     {0x11BF0008, "A restart was asked for (%1): %2."},
+    {0x11BF0009, "The change of the settings (%1) failed and could be taken back only in part: %2."},
     {0x11BF0010, "The %1 service ended unexpectedly: %2."},
     {0x11BF0011, "The %1 service runs again."},
     {0x11BF0012, "The %1 service was started by another program."},

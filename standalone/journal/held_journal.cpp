@@ -36,14 +36,17 @@ HeldJournal::~HeldJournal() {
     }
 }
 
-void HeldJournal::release() {
+Result<> HeldJournal::release() {
     ofThisThread() = nullptr;
+    Result<> outcome;
     for (const Item& item : std::exchange(items_, {})) {
-        const auto written = std::visit([](const auto& each) { return write(each); }, item);
+        auto written = std::visit([](const auto& each) { return write(each); }, item);
         if (!written) {
             ::syslog(LOG_ERR, "%s", written.error().message.c_str());
+            outcome = outcome ? std::move(written) : outcome;
         }
     }
+    return outcome;
 }
 
 bool holdBack(const HeldJournal::Item& item) {

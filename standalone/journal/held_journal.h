@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_JOURNAL_HELD_JOURNAL_H
 #define VELT_STANDALONE_JOURNAL_HELD_JOURNAL_H
 
+#include "base/result.h"
 #include "standalone/journal/log_entry.h"
 #include "standalone/journal/system_event.h"
 
@@ -25,8 +26,9 @@ public:
     /// In the order in which they came.
     const std::vector<Item>& items() const { return items_; }
 
-    /// Writes down and announces all of it, and holds no more. What cannot be written goes to syslog.
-    void release();
+    /// Writes down and announces all of it, and holds no more. Goes on after a failure, which syslog gets,
+    /// and returns the first.
+    Result<> release();
 
 private:
     friend bool holdBack(const Item& item);

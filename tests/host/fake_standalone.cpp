@@ -101,7 +101,7 @@ public:
                 tellSubscribers(*effect);
             }
         }
-        return {steps(), std::nullopt, true, ended(policy)};
+        return {steps(), std::nullopt, true, ended(policy), fake.warnings};
     }
 
 private:

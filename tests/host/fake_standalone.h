@@ -22,6 +22,7 @@ struct FakeStandalone {
     bool commitFails = false;                          ///< of the next changes, with `sentence`
     velt::ErrorNumber commitError = velt::ErrorNumber::daemon;
     bool undone = true;                      ///< what was done of a change that failed
+    std::vector<std::string> warnings;       ///< of each change that is done
     velt::IntendedPorts intended;            ///< of the last change
     std::vector<velt::ChangeRecord> history; ///< oldest first
     std::vector<std::string> askedRestarts;  ///< "SERVICE POLICY" of each that was asked for

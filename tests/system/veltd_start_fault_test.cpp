@@ -1,8 +1,8 @@
 // veltd while it starts, serves and stops, and one system call after another fails: it says why it does not
 // start, or serves, and lets nobody in whom it would not let in otherwise. The next start works.
-#include "standalone/change/unfinished_change.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
+#include "standalone/core/unfinished_change.h"
 #include "tests/support/files.h"
 #include "tests/support/run_program.h"
 #include "tests/support/text.h"

@@ -54,8 +54,24 @@ TEST_F(HostChanges, AChangeThatCannotBeDoneIsTakenBack) {
     platform.reset();
     access.undone = false;
     const Answer half = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(half.status, 500) << "nobody who asks again would mend that";
     EXPECT_EQ(half.json()["title"], "The change could be taken back only in part");
     EXPECT_EQ(half.json()["changed"], true);
+    EXPECT_EQ(access.audit, std::vector<std::string>{"VELT.Core.FileServ.FTP.SFTP v1 set: The SFTP daemon does not start: bad luck"});
+}
+
+TEST_F(HostChanges, WhatDidNotWorkBesideAChangeIsInTheAnswer) {
+    access.warnings = {"The administrator log cannot be written."};
+    const Answer ofRow = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(ofRow.status, 200) << "204 has no room for it";
+    EXPECT_EQ(ofRow.json()["warnings"][0], "The administrator log cannot be written.");
+    access.logFails = true;
+    access.sentence = "The disk is full.";
+    const Answer ofDocument = ask("PATCH", "/api/settings", admin, R"({"sftp":{"portnum":2223}})");
+    EXPECT_EQ(ofDocument.status, 200);
+    EXPECT_EQ(ofDocument.json()["warnings"].size(), 2U);
+    EXPECT_EQ(ofDocument.json()["warnings"][1],
+              "The change is not in the administrator log. The disk is full.");
 }
 
 TEST_F(HostChanges, WhatThePlatformRefusesIsTheCallersToMend) {

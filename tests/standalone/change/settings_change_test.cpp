@@ -7,6 +7,7 @@
 #include "standalone/control/start_services.h"
 #include "standalone/core/paths.h"
 #include "standalone/journal/admin_log.h"
+#include "standalone/rules/rule_store.h"
 #include "standalone/settings/settings.h"
 #include "tests/standalone/control/services_fixture.h"
 
@@ -32,6 +33,11 @@ std::string textOf(const ChangeSteps& steps) {
 
 class SettingsChangeTest : public ServicesTest {
 protected:
+    void SetUp() override {
+        ServicesTest::SetUp();
+        ASSERT_EQ(messageOf(makeRulesFile()), "");
+    }
+
     static std::unique_ptr<SettingsChange> begin(const IntendedPorts& ports = {}) {
         auto change = SettingsChange::begin(ports);
         EXPECT_TRUE(change) << messageOf(change);
@@ -124,6 +130,16 @@ TEST_F(SettingsChangeTest, ADaemonThatRunsAsWantedIsNotHandedOver) {
         EXPECT_EQ(textOf(outcome.steps), textOf(plan->steps));
         EXPECT_EQ(daemonOf("ftpd"), daemon);
     }
+}
+
+TEST_F(SettingsChangeTest, WhatAStartMakesIsInThePlan) {
+    std::filesystem::remove(statePath(paths::chrootRules));
+    const auto change = begin();
+    setRate(7);
+    const auto plan = change->plan(usual);
+    ASSERT_TRUE(plan);
+    EXPECT_NE(textOf(plan->steps).find("store chroot rules; start ftp"), std::string::npos)
+        << textOf(plan->steps);
 }
 
 TEST_F(SettingsChangeTest, NothingAskedIsNothingDone) {
@@ -241,7 +257,8 @@ TEST_F(SettingsChangeTest, APortOfAnotherProgramIsNotIntended) {
     EXPECT_NE(WebUtils::IsPortConflict("ftp", ftpPort_ - 1, ftpPort_ + 1), 0) << "nor within a range";
 }
 
-/// Runs the change in a child that is killed before the next effect after so many. False when there were fewer.
+/// Runs the change in a child that is killed before the next effect after so many. False when there were
+/// fewer.
 bool isKilledAfter(int effects, const std::function<void()>& change) {
     const pid_t child = ::fork();
     if (child == 0) {
@@ -296,7 +313,7 @@ TEST_F(SettingsChangeTest, KilledAtAnyMomentItIsTheFormerOrTheNewOne) {
             std::filesystem::remove_all(statePath("/etc/velt/run-keys"));
         }
     }
-    EXPECT_GE(kills, 14) << "each store, staged and real, each start and each entry is such a moment";
+    EXPECT_GE(kills, 16) << "each store, staged and real, each start and each entry is such a moment";
 }
 
 } // namespace

@@ -1,5 +1,5 @@
 // The note of a change that may be cut off.
-#include "standalone/change/unfinished_change.h"
+#include "standalone/core/unfinished_change.h"
 
 #include "base/file.h"
 #include "standalone/change/settings_change.h"

@@ -1,4 +1,4 @@
-#include "standalone/change/unfinished_change.h"
+#include "standalone/core/unfinished_change.h"
 
 #include "base/file.h"
 #include "base/number_text.h"
@@ -9,6 +9,7 @@
 
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <string>
 
@@ -20,6 +21,10 @@ constexpr std::string_view versionLine = "velt-unfinished-change 1";
 constexpr std::string_view endLine = "end\n";
 constexpr std::string_view absent = "absent";
 constexpr mode_t noteMode = 0600; // it holds what the files hold
+
+// Changes of this process.
+std::atomic<int> atWork{0};
+std::atomic<unsigned> begun{0};
 
 std::filesystem::path noteFile() {
     return placeBelowRoot(paths::unfinishedChange);
@@ -84,6 +89,21 @@ Result<std::vector<StagedFile>> unfinishedChange() {
                                                ": it is damaged. Check the settings, then remove it.");
     }
     return files;
+}
+
+ChangeAtWork::ChangeAtWork() {
+    ++begun;
+    ++atWork;
+}
+
+ChangeAtWork::~ChangeAtWork() {
+    --atWork;
+}
+
+bool changeWasLeft() {
+    // One that is at work during the look has a note, and may begin or end meanwhile.
+    const unsigned before = begun;
+    return atWork == 0 && fileExists(noteFile()) && atWork == 0 && begun == before;
 }
 
 } // namespace velt
