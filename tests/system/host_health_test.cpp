@@ -1,17 +1,14 @@
-// What health says of real daemons, each trouble staged: by id, and with the command that mends it.
+// What health says of real daemons, each trouble staged as it was met: by id, and with the command that mends
+// it, which the test runs.
 #include "tests/support/files.h"
+#include "tests/support/text.h"
 #include "tests/support/waiting.h"
-#include "tests/system/support/host_service.h"
+#include "tests/system/support/health_service.h"
 #include "tests/system/support/leftovers.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 #include <filesystem>
-#include <thread>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -19,65 +16,23 @@ namespace {
 
 using std::chrono::seconds;
 
-/// A port of this world that somebody else listens on.
-class TakenPort {
-public:
-    explicit TakenPort(int taken) : descriptor_(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
-        const int on = 1;
-        ::setsockopt(descriptor_, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on);
-        sockaddr_in address{};
-        address.sin_family = AF_INET;
-        address.sin_port = htons(static_cast<in_port_t>(taken));
-        EXPECT_EQ(::bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-        EXPECT_EQ(::listen(descriptor_, 1), 0);
-    }
-    ~TakenPort() { ::close(descriptor_); }
-    TakenPort(const TakenPort&) = delete;
-    TakenPort& operator=(const TakenPort&) = delete;
+const std::string firewallFile = worldRoot / "etc/velt/firewall.conf";
+const std::string rulesFile = worldRoot / "etc/velt/chroot_rules";
+const std::string sharesFile = worldRoot / "etc/velt/shares.json";
 
-private:
-    int descriptor_;
-};
-
-class HostHealth : public HostService {
+class HostHealth : public HealthService {
 protected:
-    /// The findings that are errors and warnings now, as "id: mend" lines, without those of the machine that
-    /// runs the tests.
-    static std::string diagnosis() {
-        std::this_thread::sleep_for(std::chrono::milliseconds(1100)); // a judgement is kept for a second
-        std::string text;
-        const Json::Value health = jsonOf(veltctl({"doctor", "--json"}).output);
-        for (const Json::Value& each : health["findings"]) {
-            if (each["severity"] != "notice" && each["subject"] != "host") {
-                text += each["id"].asString() + ": " + each["mend"].asString() + "\n";
-            }
+    void TearDown() override {
+        HealthService::TearDown();
+        if (whyNoWorld().empty()) {
+            runProcess({"nft", "flush", "ruleset"});
         }
-        return text;
     }
 
-    struct Pair {
-        std::string certificate;
-        std::string key;
-    };
-
-    static void give(const std::string& certificate, const std::string& key) {
-        const fs::path folder = worldRoot / "etc/velt/tls";
-        fs::create_directories(folder);
-        writeFile(folder / "server.crt", certificate);
-        writeFile(folder / "server.key", key);
-        ASSERT_EQ(::chmod((folder / "server.key").c_str(), 0600), 0);
-    }
-
-    static Pair makePair() {
-        const ProcessResult made =
-            runProcess({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt", "ec_paramgen_curve:P-256",
-                        "-nodes", "-keyout", "/mnt/made.key", "-out", "/mnt/made.crt", "-days", "100",
-                        "-subj", "/CN=files.example", "-addext", "subjectAltName=DNS:files.example"});
-        EXPECT_EQ(made.exitCode, 0) << made.errors;
-        Pair pair{contentsOf("/mnt/made.crt"), contentsOf("/mnt/made.key")};
-        fs::remove("/mnt/made.crt");
-        fs::remove("/mnt/made.key");
-        return pair;
+    static void killDaemon(const std::string& name) {
+        const std::string state = contentsOf(worldRoot / ("run/velt/" + name + ".state"));
+        const std::string pid = state.substr(state.find("\ndaemon ") + 8);
+        ASSERT_EQ(runProcess({"kill", "-KILL", pid.substr(0, pid.find(' '))}).exitCode, 0) << state;
     }
 };
 
@@ -88,103 +43,182 @@ TEST_F(HostHealth, AllIsWellWithEverythingSwitchedOn) {
     EXPECT_TRUE(waitUntil([this] { return curl("/readyz").status == 200; }, seconds(5)));
 }
 
-TEST_F(HostHealth, AKeyOfAnotherCertificateIsFoundWhileItKeepsEverybodyOut) {
-    const Pair good = makePair();
-    give(good.certificate, good.key);
+TEST_F(HostHealth, AKeyOfAnotherCertificateKeepsEverybodyOut) {
+    const Certificate good = makeCertificate();
+    putInPlace(good.text, good.key);
     done({"ftp", "set", "enable_ftp=on", "enable_ftps=on"});
-    EXPECT_EQ(diagnosis(), "");
-    give(makePair().certificate, good.key);
+    const Certificate next = makeCertificate();
+    putInPlace(next.text, good.key);
     EXPECT_EQ(fetchHome(), "") << "each session reads the files, plain ones too";
-    EXPECT_EQ(diagnosis(),
-              "no-greeting: veltctl restart ftp\n"
-              "certificate-key-mismatch: Put the key of this certificate in place, then run: veltctl restart "
-              "ftp\n");
+    const std::string found = diagnosis();
+    EXPECT_EQ(found, "no-greeting: veltctl restart ftp\n"
+                     "certificate-key-mismatch: Put the key of this certificate in place, then run: veltctl "
+                     "restart ftp\n");
     EXPECT_EQ(veltctl({"doctor"}).exitCode, 8);
     EXPECT_EQ(curl("/readyz", "", {"--header", "Authorization:"}).status, 503);
-    const Pair renewed = makePair();
-    give(renewed.certificate, renewed.key);
+    putInPlace(next.text, next.key);
+    mend(found, "certificate-key-mismatch");
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_TRUE(handshakes({"-CAfile", worldRoot / "etc/velt/tls/server.crt"}));
     EXPECT_EQ(diagnosis(), "");
 }
 
-TEST_F(HostHealth, AStartThatFailedAtTheBootIsMadeUpForAndSoIsHealth) {
+TEST_F(HostHealth, AStartThatFailedAtTheBootIsMadeUpFor) {
     done({"ftp", "set", "enable_ftp=on"});
     done({"sftp", "set", "enable=on"});
     EXPECT_EQ(stopHost(), 0);
     ASSERT_EQ(runProcess({"pkill", "--exact", "velt-supervise"}).exitCode, 0);
     ASSERT_TRUE(waitUntil([] { return !somethingListens(); }, seconds(10)));
+    furnishSftp();
+    std::string found;
     {
         const TakenPort other(port);
+        const TakenPort further(2222, TakenPort::As::bound);
         startHost();
-        const std::string found = diagnosis();
-        EXPECT_EQ(found, "service-down: veltctl restart ftp\n");
-        EXPECT_NE(veltctl({"status"}).output.find("1 error: see 'veltctl doctor'."), std::string::npos);
+        found = diagnosis();
+        EXPECT_EQ(found, "service-down: veltctl restart ftp\nservice-down: veltctl restart sftp\n");
+        EXPECT_TRUE(contains(veltctl({"status"}).output, "2 errors: see 'veltctl doctor'."));
+        const ProcessResult inVain = veltctl({"restart", "ftp"});
+        EXPECT_NE(inVain.exitCode, 0);
+        EXPECT_TRUE(contains(inVain.errors, "Port 2121 is in use by system-host-tes")) << inVain.errors;
     }
-    EXPECT_TRUE(waitUntil([] { return fetchHome() == "alice"; }, seconds(10)));
+    mend(found.substr(0, found.find('\n') + 1), "service-down");
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_TRUE(
+        waitUntil([] { return contains(done({"log"}), "The SFTP service runs again."); }, seconds(10)))
+        << "without the command, too";
+    EXPECT_TRUE(servesSftp(2222));
     EXPECT_EQ(diagnosis(), "");
-    EXPECT_NE(done({"log"}).find("The FTP service runs again."), std::string::npos);
 }
 
 TEST_F(HostHealth, AFirewallThatDoesNotFollowIsFound) {
-    const auto settings = [](const std::string& lines) {
-        writeFile(worldRoot / "etc/velt/firewall.conf", "version = 1\n" + lines);
-    };
-    settings("mode = drop\nports = 22 443\n");
+    setFirewall("mode = drop\nports = 22\n");
     done({"ftp", "set", "enable_ftp=on"});
     EXPECT_EQ(diagnosis(), "");
-    settings("mode = drop\nports = 22,443\n");
-    EXPECT_EQ(diagnosis(),
-              "firewall-settings-damaged: Correct the file, then run: systemctl restart veltd\n");
-    settings("mode = drop\nports = 22 443\n");
+    setFirewall("mode = drop\nports = 22,443\n");
+    const ProcessResult move = veltctl({"ftp", "set", "portnum=2131"});
+    EXPECT_NE(move.exitCode, 0) << "nobody could reach the new port";
+    EXPECT_TRUE(contains(move.errors, firewallFile + ", line 3")) << move.errors;
+    EXPECT_EQ(fetchHome(), "alice");
+    std::string found = diagnosis();
+    EXPECT_EQ(found, "firewall-settings-damaged: Correct the file, then run: systemctl restart veltd\n");
+    setFirewall("mode = drop\nports = 22 443\n");
+    mend(found, "firewall-settings-damaged");
+    EXPECT_EQ(diagnosis(), "");
     ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
-    EXPECT_EQ(diagnosis(), "firewall-rules-missing: systemctl restart veltd\n");
+    found = diagnosis();
+    EXPECT_EQ(found, "firewall-rules-missing: systemctl restart veltd\n");
+    mend(found, "firewall-rules-missing");
+    ASSERT_EQ(runProcess({"nft", "add table inet other; add chain inet other input { type filter hook input "
+                                 "priority 0; policy drop; }; add rule inet other input iif lo accept"})
+                  .exitCode,
+              0);
+    found = diagnosis();
+    EXPECT_EQ(found, "firewall-foreign-drop: nft list chain inet other input\n");
+    mend(found, "firewall-foreign-drop"); // shows whose chain it is
+    ASSERT_EQ(runProcess({"nft", "delete table inet other"}).exitCode, 0);
+    EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, RulesThatLockTheAdministratorOutAreNotLoaded) {
+    const NamedListener ssh("sshd", 2022);
+    done({"ftp", "set", "enable_ftp=on"});
+    setFirewall("mode = drop\nports = 22\n");
     EXPECT_EQ(stopHost(), 0);
     startHost();
+    std::string found = diagnosis();
+    EXPECT_EQ(found, "firewall-locks-out: Add 2022 to \"ports\" in " + firewallFile +
+                         ", then run: systemctl restart veltd\n"
+                         "firewall-rules-missing: systemctl restart veltd\n");
+    const ProcessResult move = veltctl({"ftp", "set", "portnum=2131"});
+    EXPECT_NE(move.exitCode, 0);
+    EXPECT_TRUE(contains(move.errors, "they would close port 2022, by which sshd is reached")) << move.errors;
+    setFirewall("mode = drop\nports = 22 2022\n");
+    mend(found, "firewall-locks-out");
     EXPECT_EQ(diagnosis(), "");
-    settings("mode = off\n");
-    done({"ftp", "set", "enable_ftp=off"});
+    EXPECT_EQ(runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).exitCode, 0);
 }
 
 TEST_F(HostHealth, FilesThatKeepEverybodyOutAreFound) {
     done({"ftp", "set", "enable_ftp=on"});
-    const fs::path rules = worldRoot / "etc/velt/chroot_rules";
-    const fs::path shares = worldRoot / "etc/velt/shares.json";
-    EXPECT_EQ(diagnosis(), "");
-    const std::string before = contentsOf(rules);
-    fs::remove(rules);
+    const std::string all = contentsOf(sharesFile);
+    fs::remove(rulesFile);
+    Json::Value misspelt = jsonOf(all);
+    misspelt["shares"][0]["users"]["alicia"] = "read";
+    writeFile(sharesFile, textOf(misspelt));
     EXPECT_EQ(fetchHome(), "") << "nobody can log in";
-    EXPECT_EQ(diagnosis(),
-              "rules-missing: Put your copy back, or, if there were no rules, run: veltctl restart ftp\n");
-    writeFile(rules, before);
-    ASSERT_EQ(::chmod(rules.c_str(), 0666), 0);
-    EXPECT_EQ(diagnosis(),
-              "rules-untrusted: chown root " + rules.string() + " && chmod go-w " + rules.string() + "\n");
-    ASSERT_EQ(runProcess({"chmod", "go-w", rules}).exitCode, 0);
-    const std::string all = contentsOf(shares);
-    writeFile(shares, "{");
-    EXPECT_EQ(diagnosis(), "shares-damaged: Correct " + shares.string() + ", then run: veltctl doctor\n");
-    writeFile(shares, all);
-    EXPECT_EQ(diagnosis(), "");
+    std::string found = diagnosis();
+    EXPECT_EQ(found,
+              "rules-missing: Put your copy back, or, if there were no rules, run: veltctl restart ftp\n"
+              "shares-unknown-account: Correct the name in " +
+                  sharesFile + ", then run: veltctl doctor\n");
+    mend(found, "rules-missing");
     EXPECT_EQ(fetchHome(), "alice");
+    writeFile(sharesFile, "{");
+    ASSERT_EQ(::chmod(rulesFile.c_str(), 0666), 0);
+    EXPECT_EQ(fetchHome(), "");
+    found = diagnosis();
+    EXPECT_EQ(found, "shares-damaged: Correct " + sharesFile +
+                         ", then run: veltctl doctor\nrules-untrusted: chown root " + rulesFile +
+                         " && chmod go-w " + rulesFile + "\n");
+    mend(found, "rules-untrusted");
+    writeFile(sharesFile, all);
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_EQ(diagnosis(), "");
 }
 
-TEST_F(HostHealth, ADaemonThatWasKilledIsInTheLog) {
+TEST_F(HostHealth, ADaemonThatWasKilledIsInTheLogAndInTheEvents) {
     done({"ftp", "set", "enable_ftp=on"});
     done({"sftp", "set", "enable=on"});
     for (const char* each : {"ftpd", "sftp"}) {
-        const std::string state = contentsOf(worldRoot / ("run/velt/" + std::string(each) + ".state"));
-        const std::string pid = state.substr(state.find("\ndaemon ") + 8);
-        ASSERT_EQ(runProcess({"kill", "-KILL", pid.substr(0, pid.find(' '))}).exitCode, 0) << state;
+        killDaemon(each);
         EXPECT_TRUE(waitUntil(
             [] {
-                const std::string log = veltctl({"log", "--limit", "1"}).output;
-                return log.find("service runs again.") != std::string::npos;
+                return contains(veltctl({"log", "--limit", "1"}).output, "service runs again.");
             },
             seconds(10)));
     }
     const std::string log = done({"log"});
-    EXPECT_NE(log.find("The FTP service ended unexpectedly: "), std::string::npos) << log;
-    EXPECT_NE(log.find("The SFTP service ended unexpectedly: "), std::string::npos) << log;
+    EXPECT_TRUE(contains(log, "The FTP service ended unexpectedly: ")) << log;
+    EXPECT_TRUE(contains(log, "The SFTP service ended unexpectedly: ")) << log;
+    const std::string events = contentsOf(worldRoot / "var/log/velt/events.jsonl");
+    EXPECT_TRUE(contains(events, R"("ended")") && contains(events, R"("recovered")")) << events;
     EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, DaemonsOfReplacedProgramsAreFound) {
+    const ReplaceablePrograms programs("/usr/sbin");
+    furnishSftp();
+    done({"ftp", "set", "enable_ftp=on"});
+    done({"sftp", "set", "enable=on"});
+    programs.replace("proftpd");
+    programs.replace("sshd");
+    FtpSession session = aliceAt();
+    const std::string found = diagnosis();
+    EXPECT_EQ(found, "program-replaced: veltctl restart ftp\nprogram-replaced: veltctl restart sftp\n");
+    mend(found, "program-replaced");
+    EXPECT_EQ(diagnosis(), "");
+    EXPECT_EQ(session.command("NOOP").code, 200) << "the port was handed over";
+    EXPECT_TRUE(servesSftp(2222));
+    session.command("QUIT");
+    done({"ftp", "set", "enable_ftp=off"});
+    done({"sftp", "set", "enable=off"});
+}
+
+TEST_F(HostHealth, APortThatIsBoundAndDoesNotListenIsNoHalfMove) {
+    done({"ftp", "set", "enable_ftp=on"});
+    {
+        const TakenPort other(2131, TakenPort::As::bound);
+        const ProcessResult move = veltctl({"ftp", "set", "portnum=2131"});
+        EXPECT_EQ(move.exitCode, 4) << move.errors;
+        EXPECT_TRUE(contains(move.errors, "2131")) << move.errors;
+        EXPECT_EQ(jsonOf(exported())["ftp"]["portnum"], port);
+        EXPECT_EQ(fetchHome(), "alice");
+        EXPECT_EQ(diagnosis(), "");
+    }
+    done({"ftp", "set", "portnum=2131"});
+    EXPECT_EQ(fetchHome(2131), "alice");
+    EXPECT_TRUE(contains(done({"log"}), "The FTP port was changed from 2121 to 2131."));
 }
 
 } // namespace
