@@ -23,7 +23,7 @@ enum class AuditEvent : unsigned {
 };
 
 struct AuditEntry {
-    AuditEvent event;
+    AuditEvent event{};
     std::array<std::string, 4> texts; ///< for the places of its sentence
 };
 
