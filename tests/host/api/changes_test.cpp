@@ -57,7 +57,9 @@ TEST_F(HostChanges, AChangeThatCannotBeDoneIsTakenBack) {
     EXPECT_EQ(half.status, 500) << "nobody who asks again would mend that";
     EXPECT_EQ(half.json()["title"], "The change could be taken back only in part");
     EXPECT_EQ(half.json()["changed"], true);
-    EXPECT_EQ(access.audit, std::vector<std::string>{"VELT.Core.FileServ.FTP.SFTP v1 set: The SFTP daemon does not start: bad luck"});
+    EXPECT_EQ(access.audit,
+              std::vector<std::string>{
+                  "VELT.Core.FileServ.FTP.SFTP v1 set: The SFTP daemon does not start: bad luck"});
 }
 
 TEST_F(HostChanges, WhatDidNotWorkBesideAChangeIsInTheAnswer) {

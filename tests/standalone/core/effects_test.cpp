@@ -24,9 +24,7 @@ Result<> refused() {
 
 class Effects : public ::testing::Test {
 protected:
-    ~Effects() override {
-        setEffectHook({});
-    }
+    ~Effects() override { setEffectHook({}); }
 };
 
 TEST_F(Effects, AreDoneWithoutAHook) {

@@ -22,11 +22,12 @@ TEST_F(ChangeHealth, ANoteThatNobodyWorksOnIsNamed) {
         ASSERT_TRUE(noteChange({}));
         EXPECT_EQ(changeFindings(), Findings()) << "it may still be done";
     }
-    EXPECT_EQ(changeFindings(), (Findings{{"change-half-undone", Severity::error, "settings",
-                                           "A change failed and could be taken back only in part: settings and "
-                                           "services may be those of before in one place, and the new ones in "
-                                           "another.",
-                                           "systemctl restart veltd"}}));
+    EXPECT_EQ(changeFindings(),
+              (Findings{{"change-half-undone", Severity::error, "settings",
+                         "A change failed and could be taken back only in part: settings and "
+                         "services may be those of before in one place, and the new ones in "
+                         "another.",
+                         "systemctl restart veltd"}}));
     ASSERT_TRUE(forgetChange());
     EXPECT_EQ(changeFindings(), Findings());
 }
