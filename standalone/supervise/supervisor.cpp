@@ -16,6 +16,7 @@
 #include <csignal>
 #include <cstring>
 #include <iterator>
+#include <thread>
 #include <utility>
 
 namespace velt {
@@ -26,6 +27,7 @@ using std::chrono::milliseconds;
 // A caller waits five seconds for a start, and needs a little of that for itself.
 constexpr milliseconds startLimit{4700};
 constexpr milliseconds patience{2000};   ///< between SIGTERM and SIGKILL
+constexpr milliseconds farewell{500};    ///< of another supervisor
 constexpr milliseconds returnLimit{700}; ///< for a daemon that served a moment ago
 
 UniqueFd openSignals() {
@@ -102,7 +104,15 @@ Result<> Supervisor::takeLock() {
     if (!lock_) {
         return Error("cannot open " + file.string() + ": " + std::strerror(errno));
     }
-    return ::flock(lock_.get(), LOCK_EX | LOCK_NB) == 0 ? Result<>() : Error("it already has a supervisor");
+    // One whose start failed is on its last lines when somebody hears of that, and starts the next.
+    const auto deadline = Clock::now() + farewell;
+    while (::flock(lock_.get(), LOCK_EX | LOCK_NB) != 0) {
+        if (Clock::now() >= deadline) {
+            return Error("it already has a supervisor");
+        }
+        std::this_thread::sleep_for(milliseconds(5));
+    }
+    return {};
 }
 
 Result<> Supervisor::startDaemon(Clock::time_point deadline) {

@@ -321,18 +321,6 @@ TEST_F(SupervisorTest, APidThatBelongsToAnotherProcessNowIsLeftAlone) {
     ::waitpid(bystander, nullptr, 0);
 }
 
-TEST_F(SupervisorTest, ASecondSupervisorOfTheServiceIsRefused) {
-    start();
-    const DaemonState before = daemonState(sftpDaemon);
-    // As two processes would see it that both found nothing running.
-    std::filesystem::remove(stateFile(statePath("/run/velt"), "sftp"));
-    const DaemonOrder other = testOrder(freePort(), "two");
-    const std::string refusal = messageOf(sftp_.start(other));
-    EXPECT_NE(refusal.find("it already has a supervisor"), std::string::npos) << refusal;
-    ASSERT_TRUE(storeDaemonState(stateFile(statePath("/run/velt"), "sftp"), before));
-    EXPECT_TRUE(isServing(before));
-}
-
 TEST_F(SupervisorTest, ItSurvivesTheEndOfTheProcessThatStartedIt) {
     const pid_t starter = ::fork();
     if (starter == 0) {
