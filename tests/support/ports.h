@@ -3,8 +3,9 @@
 
 namespace velt::test {
 
-/// A port that was free on all addresses a moment ago, outside the kernel's range for connections. The ports
-/// three below and above it are not those of another call.
+/// A port that was free on all addresses a moment ago, outside the kernel's range for connections, and is not
+/// given to another test that runs at the same time. The ports three below and above it are not those of
+/// another call.
 int freePort();
 
 /// The first of so many free ports in a row.
