@@ -146,7 +146,8 @@ std::string dryRunQuery(bool dryRun) {
 void addChangeOptions(CLI::App* command, ChangeOptions& options) {
     addDryRun(command, options.dryRun);
     CLI::Option* const keep =
-        command->add_flag("--keep-sessions", options.keepSessions, "End no open session");
+        command->add_flag("--keep-sessions", options.keepSessions,
+                          "End no open session, but those of a service that is switched off");
     command
         ->add_flag("--end-sessions", options.endSessions,
                    "End all open sessions of the services that the change concerns")
