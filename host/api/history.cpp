@@ -13,6 +13,7 @@
 
 #include <exception>
 #include <optional>
+#include <string_view>
 #include <utility>
 
 namespace velt::host {
@@ -153,6 +154,17 @@ HttpResponse changedSince(const std::vector<FieldError>& conflicts, const Call& 
     return problemWith(409, std::move(members), call.id);
 }
 
+/// What it changed is in force no more; of an undoing, what it undid is in force again.
+Result<> noteUndone(const ChangeRecord& change) {
+    constexpr std::string_view prefix = "undo ";
+    if (change.way.starts_with(prefix)) {
+        if (const auto undone = parseNumber(change.way.substr(prefix.size()))) {
+            (void)setChangeState(*undone, ChangeState::done); // it may be too old for the history
+        }
+    }
+    return setChangeState(change.id, ChangeState::undone);
+}
+
 } // namespace
 
 History::History(const ModuleTable& table, AllSettings& settings, HostLog& log)
@@ -201,7 +213,7 @@ HttpResponse History::undo(const Call& call) {
     HttpResponse response =
         settings_.store(*current, wanted, "undo " + call.path[2], std::get<ChangeOptions>(options), call);
     if (response.status == 200 && !std::get<ChangeOptions>(options).dryRun) {
-        if (const auto noted = setChangeState(record->id, ChangeState::undone); !noted) {
+        if (const auto noted = noteUndone(*record); !noted) {
             log_.write(call.id, noted.error().message);
         }
     }
@@ -244,14 +256,14 @@ bool History::takeBack(const ChangeRecord& change) {
         log_.write(call.id, current.error().message);
         return false;
     }
-    const auto logged = writeAudit({AuditEvent::takenBack, {id, {}, {}, {}}});
     const HttpResponse response =
         settings_.store(*current, undoing(change, *current).wanted, "undo " + id, {}, call);
     if (response.status != 200) {
         log_.write(call.id, "cannot take back the unconfirmed change " + id + ": " + response.body);
         return false;
     }
-    return logged && setChangeState(change.id, ChangeState::undone);
+    const auto logged = writeAudit({AuditEvent::takenBack, {id, {}, {}, {}}});
+    return logged && noteUndone(change);
 }
 
 } // namespace velt::host

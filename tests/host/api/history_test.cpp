@@ -62,6 +62,17 @@ TEST_F(HostHistory, AChangeIsUndoneOnce) {
     EXPECT_EQ(ask("POST", "/api/history/1/undo", viewer).status, 403);
 }
 
+TEST_F(HostHistory, AnUndoingCanBeUndoneAndTheChangeOnceMore) {
+    ASSERT_EQ(setTimeOut(600).status, 200);
+    ASSERT_EQ(post("/api/history/1/undo").status, 200);
+    ASSERT_EQ(post("/api/history/2/undo").status, 200);
+    EXPECT_EQ(timeOut(), 600);
+    EXPECT_EQ(get("/api/history/1").json()["state"], "done");
+    EXPECT_EQ(get("/api/history/2").json()["state"], "undone");
+    EXPECT_EQ(post("/api/history/1/undo").status, 200);
+    EXPECT_EQ(timeOut(), 300);
+}
+
 TEST_F(HostHistory, WhatWasChangedAgainIsNotUndone) {
     ASSERT_EQ(setTimeOut(600).status, 200);
     ASSERT_EQ(setTimeOut(700).status, 200);
