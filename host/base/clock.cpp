@@ -2,6 +2,7 @@
 
 #include "base/number_text.h"
 
+#include <algorithm>
 #include <ctime>
 
 namespace velt::host {
@@ -24,11 +25,18 @@ std::optional<milliseconds> parseFraction(std::string_view text) {
     return text.empty() || text == "Z" ? std::optional(milliseconds(count)) : std::nullopt;
 }
 
+/// A clock of nanoseconds ends in the year 2262, a client's text does not.
+TimePoint clamped(milliseconds since1970) {
+    constexpr auto least = std::chrono::ceil<milliseconds>(TimePoint::min().time_since_epoch());
+    constexpr auto most = std::chrono::floor<milliseconds>(TimePoint::max().time_since_epoch());
+    return TimePoint(std::clamp(since1970, least, most));
+}
+
 } // namespace
 
 std::optional<TimePoint> parseTimestamp(const std::string& text) {
     if (const auto seconds = parseNumber(text); seconds && *seconds >= 0 && *seconds < 100'000'000'000) {
-        return TimePoint(std::chrono::seconds(*seconds));
+        return clamped(std::chrono::seconds(*seconds));
     }
     std::tm parts{};
     const char* rest = strptime(text.c_str(), "%Y-%m-%dT%H:%M:%S", &parts);
@@ -40,8 +48,7 @@ std::optional<TimePoint> parseTimestamp(const std::string& text) {
         return std::nullopt;
     }
     const auto fraction = parseFraction(rest);
-    return fraction ? std::optional(std::chrono::system_clock::from_time_t(timegm(&parts)) + *fraction)
-                    : std::nullopt;
+    return fraction ? std::optional(clamped(std::chrono::seconds(timegm(&parts)) + *fraction)) : std::nullopt;
 }
 
 } // namespace velt::host

@@ -106,8 +106,9 @@ RequestReader::Step RequestReader::next() {
 
 RequestReader::Step RequestReader::readHead() {
     // Empty lines before a request are ignored, as the protocol asks.
-    while (scanned_ == 0 && end_ - begin_ >= 2 && buffer_[begin_] == '\r' && buffer_[begin_ + 1] == '\n') {
+    while (end_ - begin_ >= 2 && buffer_[begin_] == '\r' && buffer_[begin_ + 1] == '\n') {
         begin_ += 2;
+        scanned_ = 0;
     }
     const char* const head = buffer_.data() + begin_;
     const std::size_t size = end_ - begin_;

@@ -138,6 +138,16 @@ TEST(Clock, MomentsAreReadInSeveralForms) {
     EXPECT_EQ(velt::timestamp(velt::TimePoint(std::chrono::milliseconds(1'250))), "1970-01-01T00:00:01.250Z");
 }
 
+TEST(Clock, MomentsBeyondTheClockAreItsEnds) {
+    EXPECT_GT(read("2262-01-01"), read("2261-12-31"));
+    for (const char* text :
+         {"2263-01-01", "4050-01-01T00:00:00Z", "9999-12-31T23:59:59.999Z", "99999999999"}) {
+        EXPECT_EQ(read(text), read("2262-05-01")) << text;
+    }
+    EXPECT_EQ(read("0001-01-01"), read("1500-01-01"));
+    EXPECT_LT(read("1500-01-01"), read("1700-01-01"));
+}
+
 TEST(Clock, MomentsAreInUtcWhateverTheMachinesZoneIs) {
     setenv("TZ", "EST5", 1);
     tzset();
