@@ -7,6 +7,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <memory>
 
 namespace {
 
@@ -86,8 +87,9 @@ TEST_F(HostHealth, IsJudgedOnceForAllWhoAskWithinASecond) {
 }
 
 TEST_F(HostHealth, ASlowJudgementDelaysNobodyElse) {
-    std::atomic<bool> slow{true};
-    fake.whileJudged = [&slow] { waitUntil([&slow] { return !slow; }, seconds(10)); };
+    // Judgements go on until the host is stopped, after this test's own end.
+    const auto slow = std::make_shared<std::atomic<bool>>(true);
+    fake.whileJudged = [slow] { waitUntil([&] { return !*slow; }, seconds(10)); };
     start();
     Client waiting = connect();
     waiting.send(requestText("GET", "/api/health", admin));
@@ -95,7 +97,7 @@ TEST_F(HostHealth, ASlowJudgementDelaysNobodyElse) {
     EXPECT_EQ(get("/metrics").status, 200);
     EXPECT_EQ(probe("/healthz").status, 200);
     EXPECT_EQ(probe("/readyz").body, R"({"status":"unknown"})");
-    slow = false;
+    *slow = false;
     EXPECT_EQ(waiting.receive().status, 200);
 }
 
