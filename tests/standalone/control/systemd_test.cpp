@@ -189,6 +189,21 @@ TEST_F(SystemdTest, AStopOfAKilledSupervisorIsToldToSystemd) {
     EXPECT_FALSE(accepts(port_));
 }
 
+TEST_F(SystemdTest, AStopIsNotDoneWhileTheUnitCannotBeLookedAt) {
+    start("one");
+    const auto aside = root_ / "units-aside";
+    std::filesystem::rename(places_.units, aside);
+    std::filesystem::create_symlink("units", places_.units); // leads nowhere but to itself
+    const auto unit = (places_.units / "velt-sftp.service").string();
+    EXPECT_EQ(messageOf(sftp_->stop()), "The SFTP daemon cannot be stopped: Cannot look at " + unit +
+                                            ": Too many levels of symbolic links.");
+    std::filesystem::remove(places_.units);
+    std::filesystem::rename(aside, places_.units);
+    forgetCalls();
+    EXPECT_EQ(messageOf(sftp_->stop()), "");
+    EXPECT_TRUE(calls().starts_with("stop velt-sftp.service\n")) << "or the daemon would come back";
+}
+
 TEST_F(SystemdTest, AFailedStartGivesTheDaemonsWords) {
     const std::string refusal =
         messageOf(sftp_->start(testOrder(port_, "one", {"--refuse", "fatal: no such certificate"})));

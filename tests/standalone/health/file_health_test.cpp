@@ -5,11 +5,14 @@
 #include "standalone/settings/settings_store.h"
 #include "tests/standalone/health/health_test.h"
 #include "tests/standalone/support/state_folder.h"
+#include "tests/support/call_watch.h"
 #include "tests/support/result.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
+
+#include <system_error>
 
 namespace velt::test {
 namespace {
@@ -101,6 +104,24 @@ TEST_F(FileHealth, AccountsAreNotWaitedForLongerThanTheLimit) {
     const auto known = unknownAccounts({{true, "alice"}, {true, "", 0}}, std::chrono::seconds(10));
     ASSERT_TRUE(known);
     EXPECT_EQ(known->size(), 0U);
+}
+
+TEST_F(FileHealth, AccountsAreAskedForAgainAfterAThreadThatCouldNotBeHad) {
+    const auto ask = [] {
+        try {
+            const auto unknown =
+                unknownAccounts({{true, "alice"}, {true, "alcie"}}, std::chrono::seconds(10));
+            return unknown ? std::to_string(unknown->size()) + " unknown" : "no answer";
+        } catch (const std::system_error&) {
+            return std::string("no thread");
+        }
+    };
+    const auto askTwice = [&] {
+        const std::string first = ask();
+        return first + ", " + ask();
+    };
+    CallWatch watch(askTwice, [](const SeenCall& call) { return call.name == "clone3" ? call.error : 0; });
+    EXPECT_EQ(watch.finish(std::chrono::seconds(30)).told, "no thread, 1 unknown");
 }
 
 } // namespace
