@@ -5,6 +5,7 @@
 #include "host/http/session.h"
 
 #include <boost/asio/bind_executor.hpp>
+#include <boost/asio/dispatch.hpp>
 #include <boost/asio/strand.hpp>
 
 #include <sys/socket.h>
@@ -37,7 +38,9 @@ public:
     }
 
     void deliver(const std::shared_ptr<const std::string>& event) override {
-        boost::asio::post(strand_, [self = this->shared_from_this(), event] { self->push(event); });
+        session_->shared_.turns.add([self = this->shared_from_this(), event] {
+            boost::asio::dispatch(self->strand_, [self, event] { self->push(event); });
+        });
     }
 
 private:
@@ -96,7 +99,7 @@ private:
         heartbeat_.async_wait(
             boost::asio::bind_executor(strand_, [self = this->shared_from_this()](const Error& error) {
                 if (!error && !self->ended_) {
-                    self->push(std::make_shared<const std::string>(": beat\n\n"));
+                    self->deliver(std::make_shared<const std::string>(": beat\n\n"));
                     self->beat();
                 }
             }));

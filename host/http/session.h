@@ -8,6 +8,7 @@
 #include "host/http/request_reader.h"
 #include "host/http/response_text.h"
 #include "host/http/server.h"
+#include "host/http/turns.h"
 
 #include <boost/asio/basic_stream_socket.hpp>
 #include <boost/asio/buffer.hpp>
@@ -44,6 +45,7 @@ struct SessionShared {
     Places connectionPlaces{limits.connectionsOfOne};
     Places eventStreamPlaces{limits.eventStreamsOfOne};
     boost::asio::io_context context{}; // after the places, which sessions that it still holds give back
+    Turns turns{context};
     std::atomic<std::size_t> delayedRefusals{0};
 };
 
