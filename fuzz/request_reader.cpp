@@ -75,6 +75,14 @@ void checkSame(const Steps& pieces, const Steps& whole, const char* promise) {
     velt::fuzz::check(pieces == whole, promise);
 }
 
+/// Between two chunks the reader waits for the fewest bytes that could come, and so may see a fault later in
+/// pieces than in one go: but no later than with these bytes more.
+Steps readPieces(const std::string& bytes, std::size_t piece, const Steps& whole) {
+    Steps steps = read(bytes, piece);
+    const bool refusedLater = steps.size() + 1 == whole.size() && whole.back() == "refused";
+    return refusedLater ? read(bytes + "xxxxx", piece) : steps;
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -83,7 +91,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     }
     const std::string bytes = velt::fuzz::textOf(data + 1, size - 1);
     const Steps whole = read(bytes, SIZE_MAX);
-    checkSame(read(bytes, 1), whole, "byte by byte, the same requests are read");
-    checkSame(read(bytes, 1 + data[0]), whole, "in pieces, the same requests are read");
+    checkSame(readPieces(bytes, 1, whole), whole, "byte by byte, the same requests are read");
+    checkSame(readPieces(bytes, 1 + data[0], whole), whole, "in pieces, the same requests are read");
     return 0;
 }
