@@ -21,15 +21,31 @@ struct RuleOptions {
     ChangeOptions change;
 };
 
+/// All rules: with their folders, as far as the module can name the accounts; the others are there by number.
+Json::Value readRules(Context& context) {
+    Json::Value rules = context.api.get(settingsPath)["chroot_rules"];
+    const Json::Value named = context.api.read({chrootApi, 2, "load"})["rules"];
+    Json::ArrayIndex next = 0;
+    for (Json::Value& rule : rules) {
+        const bool isNext = next < named.size() && named[next]["type"] == rule["type"] &&
+                            named[next]["name"] == rule["name"] && named[next]["path"] == rule["path"];
+        if (isNext) {
+            rule = named[next++];
+        }
+    }
+    return jsonObject({{"total", rules.size()}, {"rules", rules}});
+}
+
 void showRules(Context& context) {
-    const Json::Value answer = context.api.read({chrootApi, 2, "load"});
+    const Json::Value answer = readRules(context);
     if (context.wroteJson(answer)) {
         return;
     }
     Table table({"TYPE", "NAME", "FOLDER", "EXISTS"});
     for (const Json::Value& rule : answer["rules"]) {
+        const char* const exists = rule["path_exist"] == true ? "yes" : "no";
         table.add({textAt(rule, "type"), textAt(rule, "name"), textAt(rule, "path"),
-                   rule["path_exist"] == true ? "yes" : "no"});
+                   rule.isMember("path_exist") ? exists : "account unknown"});
     }
     table.write(context.console.out);
 }

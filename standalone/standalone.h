@@ -33,6 +33,9 @@
 #include "standalone/journal/request_actor.h"
 #include "standalone/journal/subscriptions.h"
 
+// The chroot rules that a module cannot name.
+#include "standalone/rules/unnamed_rules.h"
+
 // Who is refused for a while after too many failed logins.
 #include "standalone/bans/login_guard.h"
 

@@ -5,6 +5,7 @@
 #include "host/api/document_check.h"
 #include "host/api/problem.h"
 #include "host/api/row_answer.h"
+#include "host/api/rules_section.h"
 #include "host/api/settings_document.h"
 #include "host/base/json.h"
 #include "host/module/module_call.h"
@@ -162,6 +163,11 @@ std::optional<HttpResponse> AllSettings::ask(const Json::Value& before, const Js
         const Outcome outcome = callRow(*row, each.parameters, call.principal.actor, call.principal.address);
         if (outcome.kind != Outcome::Kind::success) {
             return sectionRefusal(each.section, *row, each.parameters, outcome, openApi_, call.id);
+        }
+        if (each.section == rulesSection) {
+            if (const auto stored = storeUnnamedRules(wanted[each.section]); !stored) {
+                return failedUnchanged(stored.error().message, call.id);
+            }
         }
     }
     const auto after = readSettingsDocument(table_, call.principal);

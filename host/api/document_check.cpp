@@ -4,6 +4,7 @@
 #include "base/json_value.h"
 #include "base/number_text.h"
 #include "base/text.h"
+#include "host/api/rules_section.h"
 #include "host/api/settings_document.h"
 #include "host/base/json.h"
 #include "schema/setting_text.h"
@@ -202,7 +203,7 @@ std::optional<FieldError> faultOfRule(const Json::Value& rule, const std::string
     return std::nullopt;
 }
 
-void checkRules(const Json::Value& rules, Errors& errors) {
+void checkRules(const Json::Value& rules, const Json::Value& current, Errors& errors) {
     const std::string section = "/" + std::string(rulesSection);
     if (!rules.isArray()) {
         errors.push_back({section, "a list"});
@@ -217,6 +218,10 @@ void checkRules(const Json::Value& rules, Errors& errors) {
             const std::string type = rules[i]["type"].asString();
             errors.push_back({place + "/name", "one rule for each " + type + ", not a second one for " +
                                                    rules[i]["name"].asString()});
+        } else if (isUnnamed(rules[i]) &&
+                   std::find(current.begin(), current.end(), rules[i]) == current.end()) {
+            errors.push_back({place + "/name", "the name of a user or group; a number can only keep the "
+                                               "rule that it has"});
         }
     }
 }
@@ -269,7 +274,7 @@ std::vector<FieldError> checkSettings(const Json::Value& wanted, const Json::Val
     }
     const std::string rules(rulesSection);
     if (current.isMember(rules) && wanted[rules] != current[rules]) {
-        checkRules(wanted[rules], errors);
+        checkRules(wanted[rules], current[rules], errors);
     }
     if (errors.empty() && current.isMember(schema::ftp.name)) {
         checkFtp(wanted[schema::ftp.name], current[schema::ftp.name], errors);

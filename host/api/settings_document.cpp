@@ -3,6 +3,7 @@
 #include "base/json_value.h"
 #include "base/number_text.h"
 #include "base/text.h"
+#include "host/api/rules_section.h"
 #include "host/module/module_call.h"
 
 #include <algorithm>
@@ -58,6 +59,17 @@ Json::Value rulesIn(const Json::Value& answer) {
     return jsonArray(answer["rules"], [](const Json::Value& rule) {
         return jsonObject({{"type", rule["type"]}, {"name", rule["name"]}, {"path", rule["path"]}});
     });
+}
+
+Result<Json::Value> readRules(const Row& load, const Principal& principal) {
+    for (int attempt = 0; attempt < 3; ++attempt) {
+        VELT_ASSIGN_OR_RETURN(const auto answer, ask(load, principal));
+        VELT_ASSIGN_OR_RETURN(auto rules, allRules(rulesIn(answer)));
+        if (rules) {
+            return std::move(*rules);
+        }
+    }
+    return Error("The accounts of the chroot rules come and go while they are looked up. Try again.");
 }
 
 bool usesRange(const Json::Value& section) {
@@ -148,8 +160,7 @@ Result<Json::Value> readSettingsDocument(const ModuleTable& table, const Princip
         }
     }
     if (const Row* const row = table.find(rulesApi, rulesVersion, "load")) {
-        VELT_ASSIGN_OR_RETURN(const auto answer, ask(*row, principal));
-        document[std::string(rulesSection)] = rulesIn(answer);
+        VELT_ASSIGN_OR_RETURN(document[std::string(rulesSection)], readRules(*row, principal));
     }
     return document;
 }
@@ -191,7 +202,8 @@ std::vector<SettingsCall> callsFor(const Json::Value& before, const Json::Value&
     std::vector<SettingsCall> calls;
     const std::string rules(rulesSection);
     if (wanted[rules] != before[rules]) {
-        calls.push_back({rules, rulesApi, rulesVersion, "save", jsonObject({{"rules", wanted[rules]}})});
+        calls.push_back(
+            {rules, rulesApi, rulesVersion, "save", jsonObject({{"rules", namedRules(wanted[rules])}})});
     }
     for (const schema::SettingGroup* group : groupsInOrder) {
         const Json::Value changed = changedSettings(*group, before[group->name], wanted[group->name]);

@@ -116,6 +116,18 @@ TEST_F(ChrootTest, RulesAreShown) {
     EXPECT_EQ(jsonOf(run({"chroot", "rules", "load", "--json"}).out)["total"], 2);
 }
 
+TEST_F(ChrootTest, ARuleOfAnAccountWithoutANameIsShownAndCanBeRemoved) {
+    Json::Value whole = host.rules;
+    whole.insert(0, jsonOf(R"({"type": "user", "name": "#4711", "path": "/home"})"));
+    host.rules = whole;
+    EXPECT_EQ(run({"chroot", "rules", "load"}).out, "TYPE   NAME   FOLDER  EXISTS\n"
+                                                    "user   #4711  /home   account unknown\n"
+                                                    "user   anna   /docs   yes\n"
+                                                    "group  staff  /gone   no\n");
+    EXPECT_EQ(run({"chroot", "rules", "remove", "user", "#4711"}).out,
+              "chroot_rules: remove user #4711 /home\n");
+}
+
 TEST_F(ChrootTest, ARuleIsAddedToTheOthers) {
     const RunResult result = run({"chroot", "rules", "add", "user", "ben", "/home"});
     EXPECT_EQ(result.code, 0) << result.err;

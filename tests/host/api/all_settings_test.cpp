@@ -73,6 +73,31 @@ TEST_F(HostSettings, APatchChangesWhatItNames) {
     EXPECT_EQ(access.intended.listeners.at("sftp"), 2222);
 }
 
+TEST_F(HostSettings, RulesOfAccountsWithoutANameAreShownByNumberAndSurviveAnEditOfOthers) {
+    platform.users["anna"].uid = 1000;
+    const std::vector<std::string> stored{"user:4711:/home", "user:1000:/public", "group:42:/docs"};
+    platform.rules = stored;
+    Json::Value whole = document();
+    ASSERT_EQ(whole["chroot_rules"].size(), 3U);
+    EXPECT_EQ(velt::host::toJson(whole["chroot_rules"][0]),
+              R"({"name":"#4711","path":"/home","type":"user"})");
+    EXPECT_EQ(whole["chroot_rules"][1]["name"], "anna");
+    EXPECT_EQ(whole["chroot_rules"][2]["name"], "#42");
+    EXPECT_TRUE(put(whole).json()["changes"].empty());
+    whole["chroot_rules"][1]["path"] = "/home";
+    ASSERT_EQ(put(whole).status, 200);
+    EXPECT_EQ(platform.rules,
+              (std::vector<std::string>{"user:4711:/home", "user:1000:/home", "group:42:/docs"}));
+    Json::Value removed;
+    whole["chroot_rules"].removeIndex(0, &removed);
+    ASSERT_EQ(put(whole).status, 200);
+    EXPECT_EQ(platform.rules, (std::vector<std::string>{"user:1000:/home", "group:42:/docs"}));
+    const Answer refused = patch(R"({"chroot_rules":[{"type":"user","name":"#4711","path":"/home"}]})");
+    EXPECT_EQ(refused.status, 422) << "a rule for somebody who does not exist";
+    EXPECT_EQ(fieldsOf(refused), Fields{"/chroot_rules/0/name"});
+    EXPECT_EQ(platform.rules.size(), 2U);
+}
+
 TEST_F(HostSettings, NullIsTheDefault) {
     ASSERT_EQ(patch(R"({"ftp":{"timeout":600},"security":{"user_chroot":true}})").status, 200);
     ASSERT_EQ(patch(R"({"ftp":{"timeout":null},"security":null})").status, 200);

@@ -1,0 +1,34 @@
+// Stored chroot rules whose accounts have no name now: deleted ones, and those of a directory that does not
+// answer. Who edits rules by names has to keep them, or their users would be free.
+#ifndef VELT_STANDALONE_RULES_UNNAMED_RULES_H
+#define VELT_STANDALONE_RULES_UNNAMED_RULES_H
+
+#include "standalone/rules/chroot_rule.h"
+
+#include <cstddef>
+#include <vector>
+
+namespace velt {
+
+struct UnnamedRule {
+    std::size_t place = 0; ///< among all rules, in stored order, from 0
+    ChrootRule rule;
+
+    bool operator==(const UnnamedRule&) const = default;
+};
+
+struct RulesByName {
+    std::size_t named = 0; ///< how many rules have an account with a name
+    std::vector<UnnamedRule> unnamed;
+};
+
+/// Looks up each rule's account. Thread-safe.
+Result<RulesByName> countRulesByName();
+
+/// Puts each rule at its place among the stored ones, the first places first; at the end, where there are
+/// fewer. To be called in the change that stored the others. Thread-safe.
+Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules);
+
+} // namespace velt
+
+#endif
