@@ -25,6 +25,7 @@ inline constexpr std::string_view systemInformation = "/etc/veltinfo.conf"; ///<
 
 // What this system keeps for itself.
 inline constexpr std::string_view stateLock = "/var/lib/velt/lock";
+inline constexpr std::string_view initialized = "/var/lib/velt/initialized"; ///< empty, since the first start
 inline constexpr std::string_view unfinishedChange = "/var/lib/velt/unfinished-change";
 inline constexpr std::string_view logDatabase = "/var/lib/velt/log.db";
 inline constexpr std::string_view hostKeys = "/var/lib/velt/ssh"; ///< a folder

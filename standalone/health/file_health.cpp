@@ -5,7 +5,6 @@
 #include "standalone/health/checks.h"
 #include "standalone/health/named_accounts.h"
 #include "standalone/rules/rule_store.h"
-#include "standalone/settings/settings.h"
 #include "standalone/shares/share_file.h"
 
 #include <algorithm>
@@ -37,6 +36,12 @@ std::string quoted(const std::filesystem::path& path) {
     return path.string();
 }
 
+/// Not so of a file that cannot be looked at, which reading it tells in its own words.
+bool isMissing(const File& file) {
+    const auto there = isThere(file.path);
+    return there && !*there;
+}
+
 /// The file's text; nothing, with a finding, where logins would refuse it.
 std::optional<std::string> readAsLoginsDo(const File& file, Findings& findings) {
     auto text = readTrusted(file.path);
@@ -51,7 +56,10 @@ std::optional<std::string> readAsLoginsDo(const File& file, Findings& findings) 
 
 void judgeShares(Findings& findings, Mentions& mentions) {
     const File file{"shares", "The file of the shares", statePath(paths::shares), "shares"};
-    const auto text = fileExists(file.path) ? readAsLoginsDo(file, findings) : std::nullopt;
+    if (isMissing(file)) { // there are none
+        return;
+    }
+    const auto text = readAsLoginsDo(file, findings);
     if (!text) {
         return;
     }
@@ -75,19 +83,14 @@ void judgeShares(Findings& findings, Mentions& mentions) {
     }
 }
 
-bool ftpIsOn() {
-    const auto settings = loadFtpSettings();
-    return settings && enablesFtp(settings->record);
-}
-
 void judgeRules(Findings& findings, Mentions& mentions) {
     const File file{"chroot", "The file of the chroot rules", statePath(paths::chrootRules), "rules"};
-    if (!fileExists(file.path)) {
-        if (ftpIsOn()) { // a start makes it
-            findings.push_back(file.problem("-missing",
-                                            file.name + ", " + quoted(file.path) + ", is missing.",
-                                            "Put your copy back, or, if there were no rules, run: "
-                                            "veltctl restart ftp"));
+    if (isMissing(file)) {
+        const auto expected = areRulesExpected();
+        if (!expected || *expected) {
+            findings.push_back(
+                file.problem("-missing", file.name + ", " + quoted(file.path) + ", is missing.",
+                             "Put your copy back, or, if there were no rules, run: " + makeRulesCommand()));
         }
         return;
     }
@@ -114,7 +117,8 @@ Finding unknownAccount(const NamedAccount& account, const std::string& place) {
     return {inRule ? "rules-unknown-account" : "shares-unknown-account", Severity::warning,
             inRule ? "chroot" : "shares", "There is no " + what + ", which " + place + " names.",
             inRule
-                ? "Make the account again, or remove its line from " + quoted(statePath(paths::chrootRules))
+                ? "Make the account again, or, if it is gone for good, run: veltctl chroot rules remove " +
+                      who + " '#" + std::to_string(account.id) + "'"
                 : "Correct the name in " + quoted(statePath(paths::shares)) + ", then run: veltctl doctor"};
 }
 

@@ -49,7 +49,16 @@ Result<std::vector<ChrootRule>> parseRules(std::string_view text) {
 
 Result<std::vector<ChrootRule>> loadRules() {
     VELT_ASSIGN_OR_RETURN(const auto text, readOptionalFile(rulesFile()));
-    return text ? parseRules(*text) : std::vector<ChrootRule>();
+    if (text) {
+        return parseRules(*text);
+    }
+    VELT_ASSIGN_OR_RETURN(const bool expected, areRulesExpected());
+    if (expected) {
+        return Error(ErrorNumber::damaged,
+                     "The file of the chroot rules, " + rulesFile().string() +
+                         ", is missing. Put your copy back, or run: " + makeRulesCommand());
+    }
+    return std::vector<ChrootRule>();
 }
 
 Result<> storeRules(const std::vector<ChrootRule>& rules) {
@@ -78,6 +87,18 @@ Result<> makeRulesFile() {
         return cannot("open", rulesFile(), error ? error.value() : ENOENT);
     }
     return {};
+}
+
+Result<> expectRules() {
+    return replaceFile(statePath(paths::initialized), "", 0644);
+}
+
+Result<bool> areRulesExpected() {
+    return isThere(statePath(paths::initialized));
+}
+
+std::string makeRulesCommand() {
+    return "echo " + std::string(versionLine) + " | install -m 600 /dev/stdin " + rulesFile().string();
 }
 
 } // namespace velt

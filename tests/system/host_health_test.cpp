@@ -148,10 +148,16 @@ TEST_F(HostHealth, FilesThatKeepEverybodyOutAreFound) {
     writeFile(sharesFile, textOf(misspelt));
     EXPECT_EQ(fetchHome(), "") << "nobody can log in";
     std::string found = diagnosis();
-    EXPECT_EQ(found,
-              "rules-missing: Put your copy back, or, if there were no rules, run: veltctl restart ftp\n"
-              "shares-unknown-account: Correct the name in " +
-                  sharesFile + ", then run: veltctl doctor\n");
+    EXPECT_EQ(found, "rules-missing: Put your copy back, or, if there were no rules, run: "
+                     "echo velt-chroot-rules 1 | install -m 600 /dev/stdin " +
+                         rulesFile + "\nshares-unknown-account: Correct the name in " + sharesFile +
+                         ", then run: veltctl doctor\n");
+    done({"restart", "ftp"});
+    EXPECT_EQ(fetchHome(), "") << "a start makes no empty file, which would confine nobody";
+    const auto refused = veltctl({"chroot", "users", "add", "alice"});
+    EXPECT_NE(refused.exitCode, 0);
+    EXPECT_TRUE(contains(refused.errors, "The file of the chroot rules, " + rulesFile + ", is missing."))
+        << refused.errors;
     mend(found, "rules-missing");
     EXPECT_EQ(fetchHome(), "alice");
     writeFile(sharesFile, "{");

@@ -8,7 +8,6 @@
 #include "standalone/daemons/proftpd/proftpd_surroundings.h"
 #include "standalone/daemons/proftpd/session_rights.h"
 #include "standalone/daemons/tested_configurations.h"
-#include "standalone/rules/rule_store.h"
 
 #include <sys/stat.h>
 
@@ -78,7 +77,6 @@ Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& pla
         VELT_RETURN_IF_ERROR(makePassableFolder(folder));
     }
     VELT_RETURN_IF_ERROR(makeDaemonFolder(places));
-    VELT_RETURN_IF_ERROR(makeRulesFile());
     return confinesAnonymous(settings)
                ? replaceFile(places.anonymousShare, settings.record.anonymous_chroot_share, 0600)
                : Result<>();

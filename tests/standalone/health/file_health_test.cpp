@@ -7,6 +7,7 @@
 #include "tests/standalone/support/state_folder.h"
 #include "tests/support/call_watch.h"
 #include "tests/support/result.h"
+#include "tests/support/run_program.h"
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -74,14 +75,23 @@ TEST_F(FileHealth, AccountsThatNobodyKnowsAreNamed) {
     EXPECT_EQ(fileFindings(), Findings()) << "the daemon's own accounts count";
 }
 
-TEST_F(FileHealth, AMissingFileOfRulesIsNamedWhileFtpIsOn) {
+TEST_F(FileHealth, AMissingFileOfRulesIsNamedAndItsCommandMendsThat) {
+    ASSERT_EQ(messageOf(expectRules()), "");
     std::filesystem::remove(rules());
     const Findings found = fileFindings();
     EXPECT_EQ(summary(found), "error rules-missing");
     EXPECT_NE(found.at(0).sentence.find("Nobody can log in"), std::string::npos);
-    EXPECT_NE(found.at(0).mend.find("veltctl restart ftp"), std::string::npos);
-    ASSERT_EQ(messageOf(storeFtpSettings(defaultFtpSettings())), "");
+    const std::string& mend = found.at(0).mend;
+    ASSERT_EQ(runProcess({"sh", "-c", mend.substr(mend.find("run: ") + 5)}).exitCode, 0) << mend;
     EXPECT_EQ(fileFindings(), Findings());
+    EXPECT_EQ(loadRules(), std::vector<ChrootRule>());
+}
+
+TEST_F(FileHealth, AFileOfRulesThatCannotBeLookedAtIsNotCalledMissing) {
+    ASSERT_EQ(messageOf(expectRules()), "");
+    std::filesystem::remove(rules());
+    std::filesystem::create_symlink(rules(), rules());
+    EXPECT_EQ(summary(fileFindings()), "error rules-untrusted") << "the link leads to itself";
 }
 
 TEST_F(FileHealth, RulesThatAnybodyMayWriteAreNamed) {

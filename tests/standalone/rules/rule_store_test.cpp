@@ -44,6 +44,18 @@ TEST_F(RuleStore, isMadeOnceAndThenLeftAlone) {
     EXPECT_EQ(loadRules()->size(), 1U);
 }
 
+TEST_F(RuleStore, missesAFileThatWasLost) {
+    ASSERT_EQ(messageOf(makeRulesFile()), "");
+    ASSERT_EQ(messageOf(expectRules()), "");
+    EXPECT_EQ(loadRules(), std::vector<ChrootRule>());
+    const std::string file = (root_.path() / "etc/velt/chroot_rules").string();
+    std::filesystem::remove(file);
+    EXPECT_EQ(messageOf(loadRules()), "The file of the chroot rules, " + file +
+                                          ", is missing. Put your copy back, or run: "
+                                          "echo velt-chroot-rules 1 | install -m 600 /dev/stdin " +
+                                          file);
+}
+
 TEST_F(RuleStore, isNotMadeAnewWhereItsFileCannotBeReached) {
     ASSERT_EQ(messageOf(storeRules({{true, 1, "/home"}})), "");
     const auto file = root_.path() / "etc/velt/chroot_rules";

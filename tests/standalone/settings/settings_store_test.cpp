@@ -1,7 +1,9 @@
 #include "platform/core.h"
 #include "platform/sftp.h"
+#include "standalone/rules/rule_store.h"
 #include "standalone/settings/settings.h"
 #include "standalone/settings/settings_files.h"
+#include "standalone/settings/settings_store.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/settings/settings_fixture.h"
 #include "tests/support/result.h"
@@ -29,6 +31,32 @@ TEST_F(SettingsStore, ALaterOpeningLeavesWhatIsThere) {
     ASSERT_EQ(messageOf(openState(root_.path())), "");
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), "damaged");
     EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSettings(sftpSettingsFile(), defaultSftpSettings()));
+}
+
+TEST_F(SettingsStore, TheFirstOpeningMakesAnEmptySetOfRulesAndLaterOnesMissIt) {
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
+    EXPECT_EQ(root_.read("etc/velt/chroot_rules"), "velt-chroot-rules 1\n");
+    std::filesystem::remove(place("/etc/velt/chroot_rules"));
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
+    EXPECT_FALSE(loadRules()) << "nobody is confined by an empty file in place of the lost one";
+}
+
+TEST_F(SettingsStore, AnInstallationOfAFormerVersionHasNoRulesBeforeFtpWasSwitchedOn) {
+    ASSERT_EQ(messageOf(storeFtpSettings(defaultFtpSettings())), "");
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
+    EXPECT_EQ(loadRules(), std::vector<ChrootRule>());
+}
+
+TEST_F(SettingsStore, WhereFtpIsOnOrCannotBeToldARuleFileWasThere) {
+    FtpSettings on = defaultFtpSettings();
+    on.record.service_flags = VELT_FTP_SERVICE_PLAIN;
+    for (const std::string& settings : {formatSettings(ftpSettingsFile(), on), std::string("damaged")}) {
+        const test::TemporaryFolder root;
+        root.write("etc/velt/ftp.conf", settings);
+        ASSERT_EQ(messageOf(openState(root.path())), "");
+        EXPECT_FALSE(loadRules()) << settings;
+    }
+    setStateRoot(root_.path());
 }
 
 TEST_F(SettingsStore, AnOpeningThatCannotWriteSaysWhy) {

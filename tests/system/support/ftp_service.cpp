@@ -3,6 +3,7 @@
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/rules/rule_store.h"
 #include "tests/standalone/support/store_shares.h"
 #include "tests/support/result.h"
 
@@ -20,6 +21,7 @@ void FtpService::SetUp() {
     }
     setenv("VELT_LIBEXEC_DIR", VELT_BUILT_FOLDER, 1);
     setStateRoot(worldRoot);
+    ASSERT_EQ(messageOf(makeRulesFile()), "");
     ASSERT_EQ(VELTFTPConfGet(&record), 0);
     std::strcpy(record.portnum, "2121");
     record.service_flags = VELT_FTP_SERVICE_PLAIN;
