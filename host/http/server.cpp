@@ -13,7 +13,7 @@
 #include <unistd.h>
 
 #include <functional>
-#include <future>
+#include <mutex>
 #include <thread>
 
 namespace velt::host {
@@ -67,23 +67,30 @@ struct HttpServer::Core {
     Core(HttpHandler& theHandler, const HttpLimits& theLimits, const TlsFiles& tls)
         : shared{theHandler, theLimits}, tlsContext(makeTlsContext(tls)), sweeper(context) {}
 
+    /// With the lock of the doors, once the threads run.
     void accept(Door& door) {
         door.acceptor.async_accept(door.peer, [this, &door](const Error& error) {
+            const std::lock_guard lock(doorMutex);
             if (stopping) {
                 return;
             }
             if (!error) {
                 welcome(door);
                 accept(door);
-                return;
+            } else {
+                acceptLater(door);
             }
-            // Out of descriptors: the next attempt would fail at once, too.
-            door.pause.expires_after(acceptPause);
-            door.pause.async_wait([this, &door](const Error&) {
-                if (!stopping) {
-                    accept(door);
-                }
-            });
+        });
+    }
+
+    /// Out of descriptors: an attempt at once would fail, too.
+    void acceptLater(Door& door) {
+        door.pause.expires_after(acceptPause);
+        door.pause.async_wait([this, &door](const Error&) {
+            const std::lock_guard lock(doorMutex);
+            if (!stopping) {
+                accept(door);
+            }
         });
     }
 
@@ -127,17 +134,12 @@ struct HttpServer::Core {
     }
 
     void closeDoors() {
-        std::promise<void> closed;
-        asio::post(context, [this, &closed] {
-            stopping = true;
-            for (const auto& door : doors) {
-                Error ignored;
-                door->acceptor.close(ignored);
-                door->pause.cancel();
-            }
-            closed.set_value();
-        });
-        closed.get_future().wait();
+        const std::lock_guard lock(doorMutex);
+        stopping = true;
+        for (const auto& door : doors) {
+            Error ignored;
+            door->acceptor.close(ignored);
+        }
     }
 
     void join() {
@@ -155,9 +157,10 @@ struct HttpServer::Core {
     std::unique_ptr<asio::ssl::context> tlsContext;
     Connections connections;
     asio::executor_work_guard<Executor> work{context.get_executor()};
+    std::mutex doorMutex; ///< of both below: a door may not be closed while another thread accepts
     std::vector<std::unique_ptr<Door>> doors;
+    bool stopping = false;
     Timer sweeper;
-    std::atomic<bool> stopping{false};
     std::vector<std::thread> threads;
 };
 

@@ -2,15 +2,19 @@
 
 #include "host/http/listener.h"
 #include "tests/host/host_test.h"
+#include "tests/support/waiting.h"
 
 #include <fcntl.h>
 #include <sys/socket.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cstdlib>
 #include <fstream>
 #include <functional>
+#include <thread>
+#include <vector>
 
 namespace {
 
@@ -30,6 +34,28 @@ TEST(Listening, APortInUseIsAnError) {
     using velt::host::Listener;
     const Listener first = Listener::tcp("127.0.0.1:0", false);
     EXPECT_THROW(Listener::tcp(first.name(), false), velt::host::ListenError);
+}
+
+class Doors : public HostTest {};
+
+TEST_F(Doors, CloseWhileClientsConnect) {
+    for (int i = 0; i < 10; ++i) {
+        start();
+        std::atomic<int> connected{0};
+        std::vector<std::thread> clients;
+        for (int one = 0; one < 4; ++one) {
+            clients.emplace_back([&] {
+                while (Client::unixSocket(socketPath).connected()) {
+                    ++connected;
+                }
+            });
+        }
+        EXPECT_TRUE(velt::test::waitUntil([&] { return connected > 20; }, velt::test::patience));
+        stop();
+        for (std::thread& client : clients) {
+            client.join(); // it finds the door closed
+        }
+    }
 }
 
 class UnixSocket : public HostTest {};
