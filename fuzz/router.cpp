@@ -68,7 +68,7 @@ bool holdsWhatItSays(const HttpResponse& response) {
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     static Host host;
     fake::Platform::instance().reset();
-    FakeStandalone::instance() = {};
+    FakeStandalone::instance().reset();
     const HttpRequest request = requestOf(velt::fuzz::textOf(data, size));
     if (host.app->asksForEvents(request)) {
         return 0;

@@ -146,6 +146,16 @@ void FakeStandalone::announce(const std::string& service, const std::string& act
     eventSubscriber(event);
 }
 
+void FakeStandalone::reset() {
+    const std::lock_guard lock(mutex);
+    *this = {};
+}
+
+void FakeStandalone::damageChange(std::int64_t id) {
+    const std::lock_guard lock(mutex);
+    history.at(static_cast<std::size_t>(id) - 1).fields = "[7]";
+}
+
 namespace velt {
 
 Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service) {

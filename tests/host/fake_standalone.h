@@ -48,6 +48,14 @@ struct FakeStandalone {
 
     static FakeStandalone& instance();
 
+    // What may also be done while a host runs, which looks at the history by itself.
+
+    /// As it was at first.
+    void reset();
+
+    /// Damages what is kept of a change.
+    void damageChange(std::int64_t id);
+
     /// Announces that the service was started, stopped, ...
     void announce(const std::string& service, const std::string& action) const;
 };

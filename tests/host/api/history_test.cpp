@@ -116,7 +116,7 @@ TEST_F(HostHistory, WhatWaitedAtTheEndOfVeltdIsTakenBackByTheNext) {
 
 TEST_F(HostHistory, AnUnconfirmedChangeThatIsDamagedEndsNothing) {
     ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
-    access.history[0].fields = "[7]";
+    access.damageChange(1);
     EXPECT_TRUE(velt::test::waitUntil([&] { return logged("cannot take back the unconfirmed change 1: "); },
                                       velt::test::patience));
     EXPECT_EQ(get("/api/history/1").json()["state"], "waiting");

@@ -29,7 +29,7 @@ int ftpPlans() {
 namespace {
 
 Result<> refuseIfAsked() {
-    if (planDouble().refuse) {
+    if (planDouble().refuse.isOn()) {
         return Error(ErrorNumber::daemon, "The configuration was refused.");
     }
     return {};
