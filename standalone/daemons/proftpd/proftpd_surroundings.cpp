@@ -15,16 +15,27 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <cerrno>
+#include <cstring>
+#include <string>
+
 namespace velt {
 namespace {
 
 const std::string anonymousAccount = "ftp";
 
-bool hasIPv6() {
+// A daemon that was started without it would go on without it, so what cannot be told is not taken for a no.
+Result<bool> hasIPv6() {
     const UniqueFd socket(::socket(AF_INET6, SOCK_STREAM | SOCK_CLOEXEC, 0));
     sockaddr_in6 any{};
     any.sin6_family = AF_INET6;
-    return socket && bind(socket.get(), reinterpret_cast<const sockaddr*>(&any), sizeof any) == 0;
+    if (socket && bind(socket.get(), reinterpret_cast<const sockaddr*>(&any), sizeof any) == 0) {
+        return true;
+    }
+    if (errno == EAFNOSUPPORT || errno == EADDRNOTAVAIL) {
+        return false;
+    }
+    return Error(std::string("Cannot tell whether this server has IPv6: ") + std::strerror(errno) + ".");
 }
 
 // The daemon would still grant the login, under an account of its own choice.
@@ -34,6 +45,7 @@ Result<> checkAnonymousAccount(const FtpSettings& settings) {
     }
     const auto account = userByName(anonymousAccount);
     if (!account) {
+        VELT_RETURN_IF_ERROR(usersAreKnown());
         return Error(ErrorNumber::invalid, "Anonymous FTP needs the account \"ftp\", which does not exist.");
     }
     if (account->uid == 0) {
@@ -87,7 +99,7 @@ Result<ProftpdPlaces> ownPlaces() {
     places.loginRoot = places.runFolder / "root";
     // As long as the place in the plan's own folder, whose name is known only when all of this is.
     places.anonymousShare = places.runFolder / "configurations" / std::string(64, '0') / "anonymous";
-    places.ipv6 = hasIPv6();
+    VELT_ASSIGN_OR_RETURN(places.ipv6, hasIPv6());
     VELT_RETURN_IF_ERROR(checkRenderable(places.anonymousShare, places.stateRoot));
     VELT_RETURN_IF_ERROR(checkRenderable(places.loginProgram, places.moduleFolder));
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
