@@ -84,6 +84,7 @@ std::string sentenceOf(const Json::Value& effect) {
         {"hand over", "hands the port of ", " over to a new daemon"},
         {"pause", "pauses ", ""},
         {"stop", "stops ", " and ends its sessions"},
+        {"close", "switches ", " off and lets its sessions go on"},
         {"end sessions", "ends the sessions of ", ""},
         {"open port", "opens port ", ""},
         {"close port", "closes port ", ""},
@@ -147,7 +148,7 @@ void addChangeOptions(CLI::App* command, ChangeOptions& options) {
     addDryRun(command, options.dryRun);
     CLI::Option* const keep =
         command->add_flag("--keep-sessions", options.keepSessions,
-                          "End no open session, but those of a service that is switched off");
+                          "End no open session; a service that is switched off accepts no new ones");
     command
         ->add_flag("--end-sessions", options.endSessions,
                    "End all open sessions of the services that the change concerns")

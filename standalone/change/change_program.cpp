@@ -47,17 +47,8 @@ ProgramStep storeStep(const StagedFile& file) {
             }};
 }
 
-/// As its supervisor counts them: one process each, of the daemon or left behind by a former one. The state
-/// file has those of the moment when it was written only.
-int sessionsOf(const Daemon& daemon) {
-    const DaemonState state = daemonState(daemon);
-    if (!isAlive(state.supervisor)) {
-        return 0;
-    }
-    std::vector<ProcessId> sessions = childrenOf(state.supervisor.pid);
-    std::erase(sessions, state.daemon);
-    const auto own = state.daemon ? childrenOf(state.daemon.pid) : std::vector<ProcessId>();
-    return static_cast<int>(sessions.size() + own.size());
+int sessionCount(const Daemon& daemon) {
+    return static_cast<int>(sessionsOf(daemonState(daemon)).size());
 }
 
 /// Does it with the daemon, and tells how many of its sessions that ended.
@@ -72,10 +63,47 @@ Result<int> actOn(const Daemon& daemon, Effect effect, SessionPolicy policy, Res
     return ended;
 }
 
-ProgramStep stopStep(const Daemon& daemon) {
-    return {ChangeStep{StepKind::stop, std::string(daemon.apiName)},
-            [&daemon] { return actOn(daemon, Effect::stop, SessionPolicy::end, stopDaemon); },
-            sessionsOf(daemon)};
+bool endsSessions(const Daemon& daemon, const StagedRequest& request) {
+    const bool takesRights = &daemon == &ftpDaemon && request.takesFtpRights;
+    return request.policy == SessionPolicy::end || (request.policy == SessionPolicy::byChange && takesRights);
+}
+
+/// The end of sessions, which comes with the step before it.
+void addEndOfSessions(const Daemon& daemon, std::vector<ProgramStep>& program) {
+    if (const int count = sessionCount(daemon); count > 0) {
+        program.push_back({ChangeStep{StepKind::endSessions, std::string(daemon.apiName)}, {}, count});
+    }
+}
+
+ProgramStep stepOf(StepKind kind, const Daemon& daemon, Effect effect, SessionPolicy policy,
+                   Result<> (*act)(const Daemon&)) {
+    return {ChangeStep{kind, std::string(daemon.apiName)},
+            [&daemon, effect, policy, act] { return actOn(daemon, effect, policy, act); }};
+}
+
+/// Of a daemon that is off, or is switched off. Sessions that were let go on are not ended by what does not
+/// concern them.
+void addStop(const Daemon& daemon, const StagedRequest& request, std::vector<ProgramStep>& program) {
+    const DaemonState state = daemonState(daemon);
+    const bool isClosed = state.state == RunState::closed && isAlive(state.supervisor);
+    const bool runs = isAlive(state.supervisor) || isAlive(state.daemon);
+    const bool keeps = request.policy == SessionPolicy::keep || (isClosed && !endsSessions(daemon, request));
+    if (isClosed && keeps) {
+        return;
+    }
+    if (runs && keeps) {
+        program.push_back(stepOf(StepKind::close, daemon, Effect::stop, SessionPolicy::keep, closeDaemon));
+        return;
+    }
+    ProgramStep step = stepOf(StepKind::stop, daemon, Effect::stop, SessionPolicy::end, stopDaemon);
+    step.sessionsEnded = isClosed ? 0 : sessionCount(daemon);
+    if (isClosed || !runs) {
+        step.step.reset(); // what may be left is cleared away
+    }
+    program.push_back(std::move(step));
+    if (isClosed) {
+        addEndOfSessions(daemon, program);
+    }
 }
 
 /// Whether the daemon runs with the configuration that a start would give it.
@@ -86,26 +114,25 @@ bool runsAsWanted(const Daemon& daemon) {
 }
 
 /// What a start does, seen from outside.
-std::optional<ChangeStep> startKind(const Daemon& daemon, bool serves, bool endsSessions) {
+std::optional<ChangeStep> startKind(const Daemon& daemon, bool serves) {
     const std::string name(daemon.apiName);
     if (!serves) {
         return ChangeStep{StepKind::start, name};
     }
-    if (!runsAsWanted(daemon)) {
-        return ChangeStep{StepKind::handOver, name};
-    }
-    return endsSessions ? std::optional(ChangeStep{StepKind::endSessions, name}) : std::nullopt;
+    return runsAsWanted(daemon) ? std::nullopt : std::optional(ChangeStep{StepKind::handOver, name});
 }
 
 /// A start, in which the daemon's sessions end if the policy, or what the change takes from them, wants it.
-ProgramStep startStep(const Daemon& daemon, bool serves, const StagedRequest& request) {
-    const bool takesRights = &daemon == &ftpDaemon && request.takesFtpRights;
-    const bool ends =
-        request.policy == SessionPolicy::end || (request.policy == SessionPolicy::byChange && takesRights);
-    const SessionPolicy policy = ends ? SessionPolicy::end : request.policy;
-    return {startKind(daemon, serves, ends),
-            [&daemon, policy] { return actOn(daemon, Effect::start, policy, startDaemon); },
-            ends ? sessionsOf(daemon) : 0};
+void addStart(const Daemon& daemon, bool serves, const StagedRequest& request,
+              std::vector<ProgramStep>& program) {
+    const bool ends = endsSessions(daemon, request);
+    ProgramStep step = stepOf(StepKind::start, daemon, Effect::start,
+                              ends ? SessionPolicy::end : request.policy, startDaemon);
+    step.step = startKind(daemon, serves);
+    program.push_back(std::move(step));
+    if (ends) {
+        addEndOfSessions(daemon, program);
+    }
 }
 
 /// Outside a request, in which it would wait.
@@ -115,13 +142,6 @@ ProgramStep pauseStep(const Daemon& daemon) {
                     perform(Effect::stop, daemon.name, [&daemon] { return pauseDaemon(daemon); }));
                 return 0;
             }};
-}
-
-/// Of a daemon that has nothing else to follow.
-ProgramStep endSessionsStep(const Daemon& daemon) {
-    return {ChangeStep{StepKind::endSessions, std::string(daemon.apiName)},
-            [&daemon] { return actOn(daemon, Effect::start, SessionPolicy::end, startDaemon); },
-            sessionsOf(daemon)};
 }
 
 /// Whether another of the daemons that are still to come holds a port which this one is to have.
@@ -152,7 +172,11 @@ void addDaemonSteps(const StagedRequest& request, std::vector<ProgramStep>& prog
             next = rest.begin();
         }
         const bool serves = isServing(daemonState(*next->daemon)) && !paused.contains(next->daemon);
-        program.push_back(next->start ? startStep(*next->daemon, serves, request) : stopStep(*next->daemon));
+        if (next->start) {
+            addStart(*next->daemon, serves, request, program);
+        } else {
+            addStop(*next->daemon, request, program);
+        }
         rest.erase(next);
     }
 }
@@ -207,8 +231,10 @@ std::vector<ProgramStep> programOf(const StagedRequest& request) {
     const bool concerned =
         std::ranges::find(request.wishes, &ftpDaemon, &Wish::daemon) != request.wishes.end();
     if (request.takesFtpRights && !concerned && request.policy != SessionPolicy::keep &&
-        sessionsOf(ftpDaemon) > 0) {
-        program.push_back(endSessionsStep(ftpDaemon));
+        sessionCount(ftpDaemon) > 0) {
+        program.push_back(
+            stepOf(StepKind::endSessions, ftpDaemon, Effect::start, SessionPolicy::end, startDaemon));
+        program.back().sessionsEnded = sessionCount(ftpDaemon);
     }
     addPortSteps(StepKind::closePort, request.openBefore, request.openAfter, program);
     addPortSteps(StepKind::openPort, request.openAfter, request.openBefore, program);

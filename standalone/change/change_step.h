@@ -14,6 +14,7 @@ enum class StepKind {
     handOver,    ///< a daemon gives its port to a new one; its sessions go on with what they began with
     pause,       ///< a daemon stops listening; its sessions go on
     stop,        ///< a daemon and its sessions
+    close,       ///< a daemon that is switched off stops listening; its sessions go on to their end
     endSessions, ///< of a daemon that goes on
     openPort,    ///< "21", or "55536-55899"
     closePort,   ///< the same
@@ -30,7 +31,7 @@ struct ChangeStep {
 
 using ChangeSteps = std::vector<ChangeStep>;
 
-/// "store", "start", "hand over", "pause", "stop", "end sessions", "open port", "close port", "event", "log".
+/// "store", "start", "hand over", "pause", "stop", "close", "end sessions", "open port", "close port", "event", "log".
 std::string_view stepName(StepKind kind);
 
 } // namespace velt

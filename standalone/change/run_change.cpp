@@ -42,10 +42,16 @@ FormerStates statesOf(const std::vector<DaemonRequests::Wish>& wishes) {
 Result<> bringBack(const Daemon& daemon, RunState former) {
     const bool starts = former == RunState::running;
     return perform(starts ? Effect::start : Effect::stop, daemon.name, [&] {
-        if (starts) {
+        switch (former) {
+        case RunState::running:
             return startDaemon(daemon);
+        case RunState::paused:
+            return pauseDaemon(daemon);
+        case RunState::closed:
+            return closeDaemon(daemon);
+        default:
+            return stopDaemon(daemon);
         }
-        return former == RunState::paused ? pauseDaemon(daemon) : stopDaemon(daemon);
     });
 }
 

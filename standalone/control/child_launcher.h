@@ -16,6 +16,7 @@ public:
     Result<> launch(const std::filesystem::path& folder, const DaemonOrder& order) override;
     Result<> keep(const std::filesystem::path&, const DaemonOrder&) override { return {}; }
     Result<> retire() override { return {}; }
+    Result<> release(const std::filesystem::path&) override { return {}; }
 
 private:
     std::string daemon_;

@@ -192,6 +192,13 @@ Result<> pauseDaemon(const Daemon& daemon) {
     return counted(daemon, SupervisedDaemon(daemon).pause());
 }
 
+Result<> closeDaemon(const Daemon& daemon) {
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
+    pendingStops().waiting.erase(&daemon);
+    VELT_RETURN_IF_ERROR(counted(daemon, SupervisedDaemon(daemon).close()));
+    return followedByFirewall(noteOutcome(daemon, {}));
+}
+
 Result<> checkStart(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
     return settings.enabled() ? checkStartable(daemon, settings, daemonState(daemon)) : Result<>();

@@ -23,6 +23,10 @@ Result<> stopDaemon(const Daemon& daemon);
 /// configuration.
 Result<> stopDaemonForRestart(const Daemon& daemon);
 
+/// Ends the listener of a daemon that is off from now on, and leaves its sessions to go on to their end. A
+/// start takes them over.
+Result<> closeDaemon(const Daemon& daemon);
+
 /// Whether a start could succeed, as far as that can be told without one: fails when its ports are held by
 /// another program, or the daemon's own test refuses the stored settings. Changes nothing.
 Result<> checkStart(const Daemon& daemon);

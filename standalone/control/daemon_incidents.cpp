@@ -46,7 +46,9 @@ std::vector<Incident> IncidentTeller::look(const DaemonState& now, bool byUs, bo
     } else if (last_ && !byUs) {
         incidents = compare(now);
     }
-    if (now.state == RunState::stopped || now.state == RunState::paused) {
+    const bool isMeantToBeDown =
+        now.state == RunState::stopped || now.state == RunState::paused || now.state == RunState::closed;
+    if (isMeantToBeDown) {
         down_ = false;
     }
     // Whoever brought it back: its end was told.

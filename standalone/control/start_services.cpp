@@ -16,10 +16,18 @@ Result<> stop(const Daemon& daemon) {
     return perform(Effect::stop, daemon.name, [&] { return stopDaemon(daemon); });
 }
 
+/// Whether it is off, and its sessions were left to go on.
+bool isLeftToItsEnd(const Daemon& daemon) {
+    const DaemonState state = daemonState(daemon);
+    return state.state == RunState::closed && isAlive(state.supervisor);
+}
+
 Result<> followSettings(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
-    return settings.enabled() ? perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); })
-                              : stop(daemon);
+    if (settings.enabled()) {
+        return perform(Effect::start, daemon.name, [&] { return startDaemon(daemon); });
+    }
+    return isLeftToItsEnd(daemon) ? Result<>() : stop(daemon);
 }
 
 /// Does it with each daemon, or the named one, even after a failure with another one, and returns the first

@@ -137,6 +137,26 @@ Result<SessionCount> SupervisedDaemon::pause() {
     return paused ? paused : failure("cannot be paused", paused.error().message);
 }
 
+Result<SessionCount> SupervisedDaemon::close() {
+    constexpr const char* what = "cannot be closed";
+    VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState(what));
+    if (!isAlive(now.supervisor)) {
+        return stop(); // nobody would be there to end what is left
+    }
+    const auto answer = askSupervisor(statePath(paths::run), name_, {Command::close, {}}, endLimit);
+    auto closed = answer.value_or(Error("its supervisor does not answer"));
+    if (!closed) {
+        const bool isFormer = closed.error().message == unknownRequest;
+        return failure(what, isFormer ? "its supervisor is of a former version, which can only end the "
+                                        "sessions"
+                                      : closed.error().message);
+    }
+    if (const auto released = launcher_->release(statePath(paths::run)); !released) {
+        ::syslog(LOG_ERR, "%s", released.error().message.c_str());
+    }
+    return closed;
+}
+
 Result<SessionCount> SupervisedDaemon::stop() {
     VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("cannot be stopped"));
     std::optional<Result<SessionCount>> answer;

@@ -36,6 +36,10 @@ public:
     /// Ends the listener and its sessions, and waits for their end. Does nothing when it does not run.
     Result<SessionCount> stop();
 
+    /// Ends the listener, and lets its sessions go on to their end, with which the supervisor ends as well.
+    /// Does nothing when it does not run.
+    Result<SessionCount> close();
+
 private:
     Result<SessionCount> launch(const std::filesystem::path& folder, const DaemonOrder& order);
     Result<SessionCount> handOver(const std::filesystem::path& folder, const ProcessId& supervisor,

@@ -29,6 +29,9 @@ public:
 
     /// Sees to it that no supervisor is started again. One that still runs is ended.
     virtual Result<> retire() = 0;
+
+    /// The same, but one that still runs goes on until it ends by itself.
+    virtual Result<> release(const std::filesystem::path& folder) = 0;
 };
 
 } // namespace velt

@@ -87,4 +87,12 @@ Result<> SystemdLauncher::retire() {
     return succeeded(stopped) ? Result<>() : reasonOf(stopped);
 }
 
+/// Without an order a supervisor that is started ends at once.
+Result<> SystemdLauncher::release(const std::filesystem::path& folder) {
+    const auto file = orderFile(folder, daemon_.name);
+    std::error_code error;
+    std::filesystem::remove(file, error);
+    return error ? Result<>(cannot("remove", file, error.value())) : Result<>();
+}
+
 } // namespace velt

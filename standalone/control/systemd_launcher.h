@@ -25,6 +25,7 @@ public:
     Result<> launch(const std::filesystem::path& folder, const DaemonOrder& order) override;
     Result<> keep(const std::filesystem::path& folder, const DaemonOrder& order) override;
     Result<> retire() override;
+    Result<> release(const std::filesystem::path& folder) override;
 
 private:
     Result<> writeUnits(const std::filesystem::path& folder) const;

@@ -30,7 +30,7 @@ constexpr std::string_view keepSessions = "keep sessions";
 constexpr std::string_view sharedPorts = "shared ports";
 constexpr std::string_view ownPorts = "own ports";
 /// In the order of Command.
-constexpr std::array<std::string_view, 3> commandNames{"start", "pause", "stop"};
+constexpr std::array<std::string_view, 4> commandNames{"start", "pause", "stop", "close"};
 
 /// The socket's address by way of the folder's descriptor: a state root may lie deeper than the 107 bytes
 /// that an address has room for.

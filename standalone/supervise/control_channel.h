@@ -18,6 +18,7 @@ enum class Command {
     start, ///< make this order run; the answer comes when it does or cannot, and what ran then runs on
     pause, ///< end the listener only
     stop,  ///< end the listener and its sessions; the supervisor ends as well
+    close, ///< end the listener only; the supervisor ends with the last of the sessions
 };
 
 struct ControlRequest {

@@ -20,7 +20,7 @@ constexpr std::string_view firstLine = "velt-supervise 2";
 constexpr std::string_view bootKey = "boot ";
 
 /// In the order of RunState.
-constexpr std::array<std::string_view, 4> stateNames{"stopped", "running", "paused", "failed"};
+constexpr std::array<std::string_view, 5> stateNames{"stopped", "running", "paused", "failed", "closed"};
 
 RunState stateNamed(std::string_view text) {
     const auto* const found = std::ranges::find(stateNames, text);
@@ -52,6 +52,8 @@ void takeLine(const std::string& line, DaemonState& state) {
         state.daemon = readProcess(fields);
     } else if (key == "session") {
         state.sessions.push_back(readProcess(fields));
+    } else if (key == "retired") {
+        state.retired.push_back(readProcess(fields));
     } else if (key == "port") {
         int port = 0;
         fields >> port;
@@ -84,6 +86,9 @@ std::string render(const DaemonState& state) {
     }
     for (const ProcessId& session : state.sessions) {
         processLine("session", session);
+    }
+    for (const ProcessId& daemon : state.retired) {
+        processLine("retired", daemon);
     }
     if (!state.reason.empty()) {
         text << "reason " << oneLine(state.reason) << '\n';
@@ -149,6 +154,21 @@ bool isServing(const DaemonState& state) {
     }
     return std::all_of(state.ports.begin(), state.ports.end(),
                        [&state](int port) { return listensOn(state.daemon.pid, port); });
+}
+
+std::vector<ProcessId> sessionsOf(const DaemonState& state) {
+    if (!isAlive(state.supervisor)) {
+        return {};
+    }
+    std::vector<ProcessId> sessions = childrenOf(state.supervisor.pid);
+    std::vector<ProcessId> daemons = state.retired;
+    daemons.push_back(state.daemon);
+    for (const ProcessId& daemon : daemons) {
+        std::erase(sessions, daemon);
+        const auto own = isAlive(daemon) ? childrenOf(daemon.pid) : std::vector<ProcessId>();
+        sessions.insert(sessions.end(), own.begin(), own.end());
+    }
+    return sessions;
 }
 
 bool endLeftovers(const DaemonState& state) {

@@ -19,15 +19,17 @@ enum class RunState {
     running,
     paused, ///< no listener; sessions of the former one may go on
     failed, ///< the daemon did not start, or ended and did not come back yet
+    closed, ///< switched off: no listener; with the last of its sessions its supervisor ends
 };
 
 struct DaemonState {
     RunState state = RunState::stopped;
     ProcessId supervisor;            ///< none when it ended after a failed start
-    ProcessId daemon;                ///< none while paused or failed
+    ProcessId daemon;                ///< none while paused, failed or closed
     std::string configurationHash;   ///< what the daemon was started for
     std::vector<int> ports;          ///< on which the daemon listens
     std::vector<ProcessId> sessions; ///< those seen when the file was written
+    std::vector<ProcessId> retired;  ///< daemons with a successor, which still take what waits for them
     std::string reason;              ///< of a failure, one line
     std::uint64_t restarts = 0;      ///< of the daemon, after it had ended by itself
 };
@@ -49,6 +51,9 @@ Result<> storeDaemonState(const std::filesystem::path& file, const DaemonState& 
 
 /// Whether the daemon does what its file says: it lives and listens on its ports itself.
 bool isServing(const DaemonState& state);
+
+/// The sessions of now: one process each, of the daemon, of a retired one, or left behind by a former one.
+std::vector<ProcessId> sessionsOf(const DaemonState& state);
 
 /// Ends everything that a former supervisor left behind. False when some of it does not end.
 bool endLeftovers(const DaemonState& state);

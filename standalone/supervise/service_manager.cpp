@@ -34,4 +34,20 @@ void tellServiceManager(const std::string& assignments) {
     }
 }
 
+std::string statusLine(const DaemonState& state) {
+    switch (state.state) {
+    case RunState::running:
+        return "STATUS=the daemon serves";
+    case RunState::paused:
+        return "STATUS=paused: open sessions continue";
+    case RunState::closed:
+        return "STATUS=switched off: open sessions continue";
+    case RunState::failed:
+        return "STATUS=the daemon does not serve: " + state.reason;
+    case RunState::stopped:
+        break;
+    }
+    return "STATUS=";
+}
+
 } // namespace velt

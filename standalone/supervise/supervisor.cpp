@@ -40,28 +40,8 @@ UniqueFd openSignals() {
     return UniqueFd(::signalfd(-1, &wanted, SFD_CLOEXEC | SFD_NONBLOCK));
 }
 
-/// For administrators who look at the unit: it is active as long as the supervisor runs.
-std::string statusLine(const DaemonState& state) {
-    switch (state.state) {
-    case RunState::running:
-        return "STATUS=the daemon serves";
-    case RunState::paused:
-        return "STATUS=paused: open sessions continue";
-    case RunState::failed:
-        return "STATUS=the daemon does not serve: " + state.reason;
-    case RunState::stopped:
-        break;
-    }
-    return "STATUS=";
-}
-
 bool haveCommonPort(const DaemonOrder& one, const DaemonOrder& other) {
-    return std::ranges::any_of(
-        one.ports, [&](int port) { return std::ranges::find(other.ports, port) != other.ports.end(); });
-}
-
-void remove(std::vector<ProcessId>& processes, const ProcessId& process) {
-    std::erase(processes, process);
+    return std::ranges::find_first_of(one.ports, other.ports) != one.ports.end();
 }
 
 } // namespace
@@ -169,6 +149,8 @@ Result<SessionCount> Supervisor::handle(const ControlRequest& request) {
         return pause();
     case Command::stop:
         return stop();
+    case Command::close:
+        return close();
     }
     return Error("unknown command");
 }
@@ -187,7 +169,7 @@ Result<SessionCount> Supervisor::follow(const DaemonOrder& order, bool endSessio
     std::vector<ProcessId> settled = sessions();
     if (!unchanged) { // those of the new daemon began with the new settings
         for (const ProcessId& fresh : childrenOf(daemon_->id().pid)) {
-            remove(settled, fresh);
+            std::erase(settled, fresh);
         }
     }
     return settleSessions(settled, endSessions);
@@ -210,6 +192,9 @@ Result<> Supervisor::handOver(const DaemonOrder& order, Clock::time_point deadli
         return started;
     }
     retirement_.emplace(daemon_->id(), successor->id(), order.ports);
+    if (retirement_->proceed()) { // where nobody can be waiting for it
+        retirement_.reset();
+    }
     daemon_->retire();
     former_.push_back(std::move(daemon_));
     daemon_ = std::move(successor);
@@ -235,17 +220,14 @@ Result<> Supervisor::exchange(const DaemonOrder& order, Clock::time_point deadli
     return started;
 }
 
-/// One process each: what a daemon has started, or has left behind.
-std::vector<ProcessId> Supervisor::sessions() const {
-    std::vector<ProcessId> found = childrenOf(::getpid());
-    std::vector<ProcessId> daemons{daemon_->id()};
-    std::ranges::transform(former_, std::back_inserter(daemons), [](const auto& each) { return each->id(); });
-    for (const ProcessId& daemon : daemons) {
-        remove(found, daemon);
-        const auto own = daemon ? childrenOf(daemon.pid) : std::vector<ProcessId>();
-        found.insert(found.end(), own.begin(), own.end());
-    }
-    return found;
+DaemonState Supervisor::processes() const {
+    DaemonState now;
+    now.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+    now.daemon = daemon_->id();
+    std::ranges::transform(former_, std::back_inserter(now.retired),
+                           [](const auto& each) { return each->id(); });
+    std::erase_if(now.retired, [](const ProcessId& daemon) { return !isAlive(daemon); });
+    return now;
 }
 
 Result<SessionCount> Supervisor::settleSessions(const std::vector<ProcessId>& sessions, bool end) {
@@ -275,15 +257,39 @@ Result<SessionCount> Supervisor::stop() {
     if (!ended) {
         return Error("some of its processes did not end");
     }
+    leave();
+    return SessionCount{count, 0};
+}
+
+/// SIGTERM would end its sessions as well. Who waits at its port is not waited for: it serves nobody more.
+Result<SessionCount> Supervisor::close() {
+    restartAt_.reset();
+    finishRetirement();
+    signalProcess(daemon_->id(), SIGKILL);
+    VELT_RETURN_IF_ERROR(endDaemon());
+    order_.ports.clear();
+    publish(RunState::closed);
+    auto settled = settleSessions(sessions(), false);
+    endIfEmpty();
+    return settled;
+}
+
+void Supervisor::endIfEmpty() {
+    if (state_ == RunState::closed && descendantsOf(::getpid()).empty()) {
+        leave();
+    }
+}
+
+void Supervisor::leave() {
     ::unlink(stateFile(folder_, name_).c_str());
     finished_ = true;
-    return SessionCount{count, 0};
 }
 
 void Supervisor::finishRetirement() {
     if (retirement_) {
         retirement_->finish();
         retirement_.reset();
+        record(state_, reason_);
     }
 }
 
@@ -319,6 +325,7 @@ void Supervisor::onSignals() {
         return;
     }
     reapChildren();
+    endIfEmpty();
 }
 
 void Supervisor::reapChildren() {
@@ -368,12 +375,11 @@ int Supervisor::millisecondsToNextTask() const {
 DaemonState Supervisor::record(RunState state, std::string reason) {
     state_ = state;
     reason_ = std::move(reason);
-    DaemonState now;
+    DaemonState now = processes();
     now.state = state;
-    if (!finished_) { // a supervisor that is listed but not alive counts as killed
-        now.supervisor = identifyProcess(::getpid()).value_or(ProcessId{});
+    if (finished_) { // a supervisor that is listed but not alive counts as killed
+        now.supervisor = {};
     }
-    now.daemon = daemon_->id();
     now.configurationHash = order_.configurationHash;
     now.ports = order_.ports;
     now.restarts = restarts_;

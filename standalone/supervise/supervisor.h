@@ -33,7 +33,7 @@ public:
     /// nothing runs.
     Result<> begin(const DaemonOrder& order);
 
-    /// Returns when the daemon was stopped.
+    /// Returns when the daemon was stopped, or closed and the last of its sessions has ended.
     void run();
 
 private:
@@ -47,10 +47,14 @@ private:
     bool canHandOver(const DaemonOrder& order) const;
     Result<> handOver(const DaemonOrder& order, Clock::time_point deadline);
     Result<> exchange(const DaemonOrder& order, Clock::time_point deadline);
-    std::vector<ProcessId> sessions() const;
+    DaemonState processes() const; ///< its members that name processes
+    std::vector<ProcessId> sessions() const { return sessionsOf(processes()); }
     Result<SessionCount> settleSessions(const std::vector<ProcessId>& sessions, bool end);
     Result<SessionCount> pause();
     Result<SessionCount> stop();
+    Result<SessionCount> close();
+    void endIfEmpty();
+    void leave();
     Result<> endDaemon();
     void finishRetirement();
     void settleDaemon();

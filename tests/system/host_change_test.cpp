@@ -3,6 +3,10 @@
 #include "tests/support/waiting.h"
 #include "tests/system/support/plan_service.h"
 
+#include <filesystem>
+#include <optional>
+#include <thread>
+
 namespace velt::test {
 namespace {
 
@@ -43,6 +47,101 @@ TEST_F(HostChange, anUnconfirmedChangeIsTakenBackByTheNextVeltd) {
     startHost();
     EXPECT_TRUE(contains(exported(), "444"));
     EXPECT_TRUE(waitUntil([&] { return exported() == before; }, std::chrono::seconds(60)));
+}
+
+/// Whether the service is said to run.
+bool runs(const Json::Value& status, const std::string& service) {
+    for (const Json::Value& each : status["services"]) {
+        if (each["name"] == service) {
+            return each["running"].asBool();
+        }
+    }
+    ADD_FAILURE() << "no service " << service;
+    return false;
+}
+
+class HostClosing : public PlanService {
+protected:
+    void SetUp() override {
+        PlanService::SetUp();
+        furnishSftp();
+        done({"ftp", "set", "enable_ftp=on"});
+        done({"sftp", "set", "enable=on"});
+        session_.emplace(aliceAt());
+        download_ = std::thread([this] { result_ = sftp(2222, "get large /mnt/got\n", "700"); });
+        EXPECT_TRUE(waitUntil([] { return std::filesystem::exists("/mnt/got"); }, patience));
+    }
+
+    void TearDown() override {
+        endDownload();
+        std::filesystem::remove("/mnt/got");
+        PlanService::TearDown();
+    }
+
+    /// What it came to.
+    int endDownload() {
+        if (download_.joinable()) {
+            download_.join();
+        }
+        return result_.exitCode;
+    }
+
+    bool sessionGoesOn() { return session_->command("NOOP").code == 200; }
+    static bool accepts(int atPort) { return connectTo("127.0.0.1", atPort).get() >= 0; }
+
+    std::optional<FtpSession> session_;
+    std::thread download_;
+    ProcessResult result_;
+};
+
+TEST_F(HostClosing, keptSessionsGoOnWhileTheServicesAcceptNobody) {
+    done({"ftp", "set", "enable_ftp=off", "--keep-sessions"});
+    done({"sftp", "set", "enable=off", "--keep-sessions"});
+    EXPECT_FALSE(accepts(port) || accepts(2222));
+    EXPECT_EQ(systemNow().firewall, std::vector<std::string>());
+    const Json::Value status = curl("/api/status").json;
+    EXPECT_FALSE(runs(status, "ftp") || runs(status, "sftp")) << textOf(status);
+    EXPECT_EQ(curl("/api/health").json["findings"].size(), 0U) << curl("/api/health").body;
+    EXPECT_TRUE(sessionGoesOn());
+    stopHost();
+    startHost();
+    EXPECT_TRUE(sessionGoesOn()) << "after a restart of veltd";
+    done({"ftp", "set", "timeout=444"});
+    EXPECT_TRUE(sessionGoesOn()) << "after a change that does not concern it";
+    EXPECT_EQ(endDownload(), 0) << result_.errors;
+    EXPECT_EQ(std::filesystem::file_size("/mnt/got"), largeSize);
+    EXPECT_EQ(session_->command("QUIT").code, 221);
+    EXPECT_TRUE(
+        waitUntil([] { return !std::filesystem::exists(worldRoot / "run/velt/ftpd.state"); }, patience));
+    const Json::Value log = curl("/api/log?limit=100").json;
+    EXPECT_FALSE(contains(textOf(log), "another program")) << textOf(log);
+}
+
+TEST_F(HostClosing, aServiceThatIsSwitchedOnAgainTakesThemOver) {
+    const std::string off = R"({"ftp": {"enable_ftp": false}, "sftp": {"enable": false}})";
+    EXPECT_EQ(patch(off, "?sessions=keep").json["sessions_ended"], 0);
+    const HttpResult on = patch(R"({"ftp": {"enable_ftp": true}, "sftp": {"enable": true}})");
+    EXPECT_EQ(on.json["sessions_ended"], 0) << on.body;
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_TRUE(servesSftp(2222));
+    EXPECT_TRUE(sessionGoesOn());
+    EXPECT_EQ(session_->receive("RETR home-of").value_or(""), "alice");
+    const Json::Value status = curl("/api/status").json;
+    EXPECT_TRUE(runs(status, "ftp") && runs(status, "sftp")) << textOf(status);
+    EXPECT_EQ(curl("/api/health").json["findings"].size(), 0U) << curl("/api/health").body;
+    EXPECT_EQ(patch(off, "?dry_run=true").json["sessions_ended"], 2);
+    EXPECT_EQ(patch(off).json["sessions_ended"], 2);
+    EXPECT_FALSE(sessionGoesOn());
+    EXPECT_NE(endDownload(), 0);
+}
+
+TEST_F(HostClosing, keptSessionsEndWhereAskedFor) {
+    const std::string off = R"({"ftp": {"enable_ftp": false}})";
+    EXPECT_EQ(patch(off, "?sessions=keep").status, 200);
+    const HttpResult plan = patch(R"({"ftp": {"timeout": 445}})", "?dry_run=true&sessions=end");
+    EXPECT_EQ(plan.json["sessions_ended"], 1) << plan.body;
+    EXPECT_EQ(patch(R"({"ftp": {"timeout": 445}})", "?sessions=end").json["sessions_ended"], 1);
+    EXPECT_FALSE(sessionGoesOn());
 }
 
 } // namespace

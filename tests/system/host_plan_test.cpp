@@ -75,6 +75,57 @@ TEST_F(HostPlan, holdsForEachFieldOfTheDocument) {
     EXPECT_EQ(covered, fields);
 }
 
+TEST_F(HostPlan, holdsForTheSessionsAndForWhatIsOff) {
+    for (const std::string sessions : {"", "sessions=keep", "sessions=end"}) {
+        for (const char* body :
+             {R"({"ftp": {"enable_ftp": true}, "sftp": {"enable": true}})",
+              R"({"security": {"anonymous": true}})", R"({"security": {"anonymous": false}})",
+              R"({"sftp": {"portnum": 2019}})",
+              R"({"chroot_rules": [{"type": "user", "name": "alice", "path": "/public"}]})",
+              R"({"ftp": {"enable_ftp": false}})",
+              R"({"ftp": {"timeout": 420, "portnum": 2008}, "chroot_rules": []})",
+              R"({"sftp": {"enable": false}})", R"({"ftp": null, "sftp": {"portnum": 2029}})"}) {
+            expectAsPlanned(body + (" " + sessions), [&](const std::string& query) {
+                const char* const join = query.empty() ? "?" : "&";
+                return patch(body, sessions.empty() ? query : query + join + sessions);
+            });
+        }
+    }
+}
+
+/// The effects of a plan that concern daemons and their sessions.
+std::vector<std::string> fates(const HttpResult& plan) {
+    std::vector<std::string> found;
+    for (const Json::Value& each : plan.json["effects"]) {
+        const std::string subject = each["subject"].asString();
+        if (subject == "ftp" || subject == "sftp") {
+            found.push_back(each["effect"].asString() + " " + subject);
+        }
+    }
+    return found;
+}
+
+TEST_F(HostPlan, namesTheEndOfSessionsAndNothingThatDoesNotRun) {
+    using Fates = std::vector<std::string>;
+    const std::string ask = "?dry_run=true";
+    EXPECT_EQ(fates(patch(R"({"ftp": {"timeout": 410}})", ask)), Fates()) << "nothing runs";
+    done({"ftp", "set", "enable_ftp=on"});
+    done({"security", "set", "anonymous=on"});
+    const std::string less = R"({"security": {"anonymous": false}})";
+    const HttpResult handedOver = patch(less, ask);
+    EXPECT_EQ(fates(handedOver), (Fates{"hand over ftp"}));
+    EXPECT_EQ(handedOver.json["sessions_ended"], 0) << "the former daemon is no session";
+    const FtpSession session = aliceAt();
+    const HttpResult cutting = patch(less, ask);
+    EXPECT_EQ(fates(cutting), (Fates{"hand over ftp", "end sessions ftp"}));
+    EXPECT_EQ(cutting.json["sessions_ended"], 1);
+    const std::string off = R"({"ftp": {"enable_ftp": false}})";
+    EXPECT_EQ(fates(patch(off, ask)), (Fates{"stop ftp"}));
+    const HttpResult closing = patch(off, ask + "&sessions=keep");
+    EXPECT_EQ(fates(closing), (Fates{"close ftp"}));
+    EXPECT_EQ(closing.json["sessions_ended"], 0);
+}
+
 TEST_F(HostPlan, holdsForEachMethod) {
     const std::vector<std::pair<std::string, std::string>> writing{
         {"/api/VELT.Core.FileServ.FTP/v3/set",

@@ -117,6 +117,8 @@ TEST_F(SettingsChangeTest, ADaemonThatRunsAsWantedIsNotHandedOver) {
     const ProcessId daemon = daemonOf("ftpd");
     const std::string stored = "store run key of ftpd; ";
     const std::string logged = "log The SFTP port was changed from 1 to 2.";
+    Client client(ftpPort_);
+    ASSERT_TRUE(client.isServed());
     const std::pair<SessionPolicy, std::string> cases[]{{usual, ""},
                                                         {SessionPolicy::end, "end sessions ftp; "}};
     for (const auto& [policy, ends] : cases) {
@@ -129,7 +131,62 @@ TEST_F(SettingsChangeTest, ADaemonThatRunsAsWantedIsNotHandedOver) {
         ASSERT_FALSE(outcome.failure) << outcome.failure->message;
         EXPECT_EQ(textOf(outcome.steps), textOf(plan->steps));
         EXPECT_EQ(daemonOf("ftpd"), daemon);
+        EXPECT_EQ(client.isServed(), policy == usual);
     }
+}
+
+TEST_F(SettingsChangeTest, WhatIsOffIsNotStoppedOnceMore) {
+    storeFtp(0);
+    const auto change = begin();
+    storeFtp(0, 7);
+    ASSERT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    const auto plan = change->plan(SessionPolicy::end);
+    ASSERT_TRUE(plan);
+    EXPECT_EQ(textOf(plan->steps), "store ftp settings");
+}
+
+TEST_F(SettingsChangeTest, WhatIsSwitchedOffKeepsItsSessionsWhereAsked) {
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    Client client(ftpPort_);
+    ASSERT_TRUE(client.isServed());
+    const auto switchOff = [&](SessionPolicy policy, int rate) {
+        const auto change = begin();
+        storeFtp(0, rate);
+        EXPECT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+        const auto plan = change->plan(policy);
+        EXPECT_TRUE(plan) << messageOf(plan);
+        const auto outcome = change->commit(policy);
+        EXPECT_FALSE(outcome.failure);
+        EXPECT_EQ(textOf(outcome.steps), plan ? textOf(plan->steps) : "");
+        EXPECT_EQ(outcome.sessionsEnded, plan ? plan->sessionsEnded : -1);
+        return textOf(outcome.steps) + ", ends " + std::to_string(outcome.sessionsEnded);
+    };
+    EXPECT_EQ(switchOff(SessionPolicy::keep, 0), "store ftp settings; close ftp; close port " +
+                                                     std::to_string(ftpPort_) +
+                                                     "; close port 55536-55899, ends 0");
+    EXPECT_FALSE(accepts(ftpPort_));
+    EXPECT_EQ(switchOff(usual, 7), "store ftp settings, ends 0") << "a change that takes nothing away";
+    EXPECT_EQ(messageOf(startEnabledServices()), "") << "as the next veltd does";
+    EXPECT_TRUE(client.isServed());
+    EXPECT_EQ(switchOff(SessionPolicy::end, 8), "store ftp settings; end sessions ftp, ends 1");
+    EXPECT_FALSE(client.isServed());
+}
+
+TEST_F(SettingsChangeTest, SessionsThatWereKeptAreBackWithTheirServiceWhenTheChangeFails) {
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    Client client(ftpPort_);
+    ASSERT_TRUE(client.isServed());
+    const auto change = begin();
+    storeFtp(0);
+    ASSERT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
+    storeSftp(true);
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    planDouble().sftpOptions = {"--refuse", "fatal: no luck"};
+    const auto outcome = change->commit(SessionPolicy::keep);
+    ASSERT_TRUE(outcome.failure);
+    EXPECT_TRUE(outcome.undone);
+    EXPECT_TRUE(accepts(ftpPort_));
+    EXPECT_TRUE(client.isServed());
 }
 
 TEST_F(SettingsChangeTest, WhatAStartMakesIsInThePlan) {

@@ -157,6 +157,22 @@ TEST_F(SystemdTest, TheStockServersStopLeavesTheFolderThatEachConnectionNeeds) {
     EXPECT_FALSE(std::filesystem::exists(places_.units / "ssh.service.d")) << "FTP does not need it";
 }
 
+TEST_F(SystemdTest, WhatIsClosedIsNotStartedAgain) {
+    start("one");
+    Client client(port_);
+    ASSERT_TRUE(client.isServed());
+    forgetCalls();
+    ASSERT_EQ(messageOf(sftp_->close()), "");
+    EXPECT_FALSE(accepts(port_));
+    EXPECT_TRUE(client.isServed());
+    EXPECT_EQ(calls(), "") << "the unit goes on until the last session has ended";
+    EXPECT_FALSE(std::filesystem::exists(orderFile(statePath("/run/velt"), "sftp")))
+        << "without it a supervisor that systemd starts ends at once";
+    start("two");
+    EXPECT_TRUE(std::filesystem::exists(orderFile(statePath("/run/velt"), "sftp")));
+    EXPECT_TRUE(client.isServed());
+}
+
 TEST_F(SystemdTest, SessionsThatWereMovedOutOfTheUnitOutliveAPauseAndEndWithAStop) {
     start("one");
     Client client(port_); // no control group tells whose session this is

@@ -72,6 +72,19 @@ TEST_F(HandOverTest, SessionsGoOnWithTheirFormerDaemonGone) {
     EXPECT_TRUE(Client(port_).isServed());
 }
 
+TEST_F(HandOverTest, AFormerDaemonThatStaysForAMomentIsNoSession) {
+    start("one");
+    const ProcessId former = daemonState(ftpDaemon).daemon;
+    Client client(port_);
+    ASSERT_TRUE(client.isServed());
+    start("two");
+    const auto sessions = sessionsOf(daemonState(ftpDaemon));
+    ASSERT_TRUE(isAlive(former)) << "it stays for those who began to connect";
+    EXPECT_EQ(sessions.size(), 1U);
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, patience));
+    EXPECT_EQ(sessionsOf(daemonState(ftpDaemon)), sessions);
+}
+
 TEST_F(HandOverTest, SessionsOfAllFormerDaemonsEndWithAStop) {
     std::vector<std::unique_ptr<Client>> clients;
     for (const char* hash : {"one", "two", "three", "four"}) {
@@ -240,6 +253,68 @@ TEST_F(HandOverTest, ASupervisorOfAnotherVersionIsReplaced) {
     former.join();
     EXPECT_NE(daemonState(ftpDaemon).supervisor, supervisor);
     EXPECT_TRUE(Client(port_).isServed());
+}
+
+TEST_F(HandOverTest, WhatIsClosedAcceptsNobodyAndEndsWithItsLastSession) {
+    start("one");
+    Client first(port_);
+    ASSERT_TRUE(first.isServed());
+    start("two");
+    const ProcessId supervisor = daemonState(ftpDaemon).supervisor;
+    {
+        Client second(port_);
+        ASSERT_TRUE(second.isServed());
+        const auto closed = ftp_.close();
+        ASSERT_EQ(messageOf(closed), "");
+        EXPECT_EQ(*closed, (SessionCount{0, 2}));
+        EXPECT_EQ(listenersOn(port_), 0U);
+        EXPECT_EQ(daemonState(ftpDaemon).state, RunState::closed);
+        EXPECT_EQ(sessionsOf(daemonState(ftpDaemon)).size(), 2U);
+        EXPECT_TRUE(first.isServed());
+        EXPECT_TRUE(second.isServed());
+    }
+    EXPECT_TRUE(waitUntil([&] { return sessionsOf(daemonState(ftpDaemon)).size() == 1; }, patience));
+    EXPECT_TRUE(isAlive(supervisor));
+    EXPECT_TRUE(first.isServed());
+    signalProcess(sessionsOf(daemonState(ftpDaemon)).at(0), SIGTERM);
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, patience));
+    EXPECT_EQ(daemonState(ftpDaemon).state, RunState::stopped);
+    EXPECT_TRUE(waitUntil([] { return leftProcesses().empty(); }, patience));
+}
+
+TEST_F(HandOverTest, WhatIsClosedWithoutSessionsEndsAtOnce) {
+    start("one");
+    const ProcessId supervisor = daemonState(ftpDaemon).supervisor;
+    EXPECT_EQ(ftp_.close().valueOr({1, 1}), (SessionCount{0, 0}));
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, patience));
+    EXPECT_EQ(daemonState(ftpDaemon).state, RunState::stopped);
+    EXPECT_EQ(messageOf(ftp_.close()), "") << "there is nothing to do";
+}
+
+TEST_F(HandOverTest, AStartTakesOverTheSessionsOfWhatWasClosed) {
+    start("one");
+    Client former(port_);
+    ASSERT_TRUE(former.isServed());
+    const ProcessId supervisor = daemonState(ftpDaemon).supervisor;
+    ASSERT_EQ(messageOf(ftp_.close()), "");
+    EXPECT_EQ(start("one"), (SessionCount{0, 1}));
+    EXPECT_EQ(daemonState(ftpDaemon).supervisor, supervisor);
+    EXPECT_TRUE(isServing(daemonState(ftpDaemon)));
+    Client next(port_);
+    EXPECT_TRUE(next.isServed());
+    EXPECT_TRUE(former.isServed());
+    EXPECT_EQ(ftp_.stop().valueOr({}), (SessionCount{2, 0}));
+    EXPECT_FALSE(former.isServed());
+}
+
+TEST_F(HandOverTest, AStopEndsTheSessionsOfWhatWasClosed) {
+    start("one");
+    Client client(port_);
+    ASSERT_TRUE(client.isServed());
+    ASSERT_EQ(messageOf(ftp_.close()), "");
+    EXPECT_EQ(ftp_.stop().valueOr({}), (SessionCount{1, 0}));
+    EXPECT_FALSE(client.isServed());
+    EXPECT_TRUE(leftProcesses().empty());
 }
 
 TEST_F(HandOverTest, NewConnectionsGoToTheSuccessorAlone) {

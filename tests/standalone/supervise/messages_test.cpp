@@ -46,8 +46,8 @@ protected:
 };
 
 TEST_F(StateFile, ComesBackAsItWasWritten) {
-    const DaemonState state{RunState::failed,       {10, 100},   {11, 110}, "a hash", {21, 22},
-                            {{12, 120}, {13, 130}}, "two\nlines"};
+    const DaemonState state{RunState::failed,       {10, 100},   {11, 110},   "a hash", {21, 22},
+                            {{12, 120}, {13, 130}}, {{14, 140}}, "two\nlines"};
     ASSERT_TRUE(storeDaemonState(file_, state));
     const auto read = loadDaemonState(file_);
     ASSERT_TRUE(read);
@@ -57,6 +57,7 @@ TEST_F(StateFile, ComesBackAsItWasWritten) {
     EXPECT_EQ(read->configurationHash, state.configurationHash);
     EXPECT_EQ(read->ports, state.ports);
     EXPECT_EQ(read->sessions, state.sessions);
+    EXPECT_EQ(read->retired, state.retired);
     EXPECT_EQ(read->reason, "two lines");
 }
 

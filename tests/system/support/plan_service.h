@@ -22,11 +22,11 @@ protected:
 
     HttpResult patch(const std::string& body, const std::string& query = "") const;
 
-    /// When a former daemon that shares its port with the new one is gone.
+    /// When former daemons are gone.
     static SystemMoment settled();
 
     /// The dry run does nothing, and the change does what it said, no more and no less, as far as that can be
-    /// seen from outside. `what` is for the message of a failure.
+    /// seen from outside; the same for the sessions that it ends, of some that are open. `what` is for the message of a failure.
     void expectAsPlanned(const std::string& what, const Ask& ask);
     /// The same for a patch of the document.
     void expectAsPlanned(const std::string& patchBody);
