@@ -20,6 +20,7 @@ enum class AuditEvent : unsigned {
     tokenDeleted = 0x11BF0007,
     restarted = 0x11BF0008,
     takenBackInPart = 0x11BF0009,
+    superseded = 0x11BF000A,
 };
 
 struct AuditEntry {

@@ -154,6 +154,15 @@ HttpResponse changedSince(const std::vector<FieldError>& conflicts, const Call& 
     return problemWith(409, std::move(members), call.id);
 }
 
+/// "/ftp/timeout and /ftp/portnum"
+std::string fieldsIn(const std::vector<FieldError>& conflicts) {
+    std::string fields;
+    for (const FieldError& each : conflicts) {
+        fields += (fields.empty() ? "" : " and ") + each.field;
+    }
+    return fields;
+}
+
 /// What it changed is in force no more; of an undoing, what it undid is in force again.
 Result<> noteUndone(const ChangeRecord& change) {
     constexpr std::string_view prefix = "undo ";
@@ -256,13 +265,20 @@ bool History::takeBack(const ChangeRecord& change) {
         log_.write(call.id, current.error().message);
         return false;
     }
-    const HttpResponse response =
-        settings_.store(*current, undoing(change, *current).wanted, "undo " + id, {}, call);
+    const auto [wanted, conflicts] = undoing(change, *current);
+    const std::string kept = fieldsIn(conflicts);
+    if (conflicts.size() == fieldsOf(change).size()) {
+        const std::string verb = conflicts.size() == 1 ? " was" : " were";
+        const auto logged = writeAudit({AuditEvent::superseded, {id, kept + verb, {}, {}}});
+        return logged && setChangeState(change.id, ChangeState::superseded);
+    }
+    const HttpResponse response = settings_.store(*current, wanted, "undo " + id, {}, call);
     if (response.status != 200) {
         log_.write(call.id, "cannot take back the unconfirmed change " + id + ": " + response.body);
         return false;
     }
-    const auto logged = writeAudit({AuditEvent::takenBack, {id, {}, {}, {}}});
+    const std::string but = kept.empty() ? "" : ", but for " + kept + ", changed again since";
+    const auto logged = writeAudit({AuditEvent::takenBack, {id, but, {}, {}}});
     return logged && noteUndone(change);
 }
 

@@ -16,6 +16,9 @@ Findings serviceFindings();
 /// A change that failed and could not be taken back, or not wholly.
 Findings changeFindings();
 
+/// An administrator log that cannot be used; changes that nobody confirmed and that are in force nevertheless.
+Findings journalFindings(TimePoint now);
+
 /// Services that run, and do not greet or take up TLS as their clients expect, or serve a certificate other
 /// than the stored one.
 Findings greetingFindings();

@@ -21,6 +21,7 @@ Findings judgeHealth() {
     using Check = Findings (*)();
     static constexpr std::array checks{
         Check{changeFindings},
+        Check{[] { return journalFindings(std::chrono::system_clock::now()); }},
         Check{serviceFindings},
         Check{greetingFindings},
         Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},

@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 33> entries{{
+constexpr std::array<CatalogueEntry, 34> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -37,12 +37,14 @@ constexpr std::array<CatalogueEntry, 33> entries{{
     {0x11BF0001, "Logins from %1 are refused for %2 seconds after %3 failed ones at %4."},
     {0x11BF0002, "The ban of %1 was lifted."},
     {0x11BF0003, "The settings were changed (%1): %2."},
-    {0x11BF0004, "The change %1 was not confirmed in time and is taken back."},
+    {0x11BF0004, "The change %1 was not confirmed in time and was taken back%2."},
     {0x11BF0005, "The change %1 was confirmed."},
     {0x11BF0006, "A token with the role %2 was made for \"%1\"; its id is %3."},
     {0x11BF0007, "The token %3 with the role %2, made for \"%1\", was deleted."},
     {0x11BF0008, "A restart was asked for (%1): %2."},
     {0x11BF0009, "The change of the settings (%1) failed and could be taken back only in part: %2."},
+    {0x11BF000A,
+     "The change %1 was not confirmed in time, but nothing was taken back: %2 changed again since."},
     {0x11BF0010, "The %1 service ended unexpectedly: %2."},
     {0x11BF0011, "The %1 service runs again."},
     {0x11BF0012, "The %1 service was started by another program."},

@@ -97,6 +97,17 @@ public:
         return sqlite3_last_insert_rowid(database_.get());
     }
 
+    /// Begins to write, and gives it up again. Others who write just now show that it can be done.
+    Result<> tryToWrite() {
+        sqlite3_busy_timeout(database_.get(), 0);
+        const int begun = execute(database_.get(), "BEGIN IMMEDIATE");
+        if (begun != SQLITE_OK && begun != SQLITE_BUSY) {
+            return cannotBe("written");
+        }
+        (void)execute(database_.get(), "ROLLBACK");
+        return {};
+    }
+
     /// What the rest of the query, with these numbers in it, selects.
     Result<std::vector<ChangeRecord>> select(const std::string& rest,
                                              std::initializer_list<std::int64_t> numbers) {
@@ -157,7 +168,7 @@ Result<> removeOld(History& history, std::int64_t newest, system_clock::time_poi
 
 std::string changeStateName(ChangeState state) {
     // In the order of ChangeState.
-    constexpr std::array<const char*, 4> names{"done", "waiting", "confirmed", "undone"};
+    constexpr std::array<const char*, 5> names{"done", "waiting", "confirmed", "undone", "superseded"};
     return names.at(static_cast<std::size_t>(state));
 }
 
@@ -166,6 +177,11 @@ Result<std::int64_t> recordChange(const ChangeRecord& change) {
     VELT_ASSIGN_OR_RETURN(const auto id, history.insert(change));
     VELT_RETURN_IF_ERROR(removeOld(history, id, change.time));
     return id;
+}
+
+Result<> checkHistoryCanBeWritten() {
+    VELT_ASSIGN_OR_RETURN(auto history, History::open());
+    return history.tryToWrite();
 }
 
 Result<> setChangeState(std::int64_t id, ChangeState state) {

@@ -17,9 +17,10 @@ enum class ChangeState {
     waiting,   ///< done, and taken back unless somebody confirms it in time
     confirmed, ///< done, and was confirmed
     undone,
+    superseded, ///< was not confirmed, and all that it changed was changed again since
 };
 
-/// "done", "waiting", "confirmed", "undone".
+/// "done", "waiting", "confirmed", "undone", "superseded".
 std::string changeStateName(ChangeState state);
 
 /// An accepted change of the settings.
@@ -49,6 +50,9 @@ inline constexpr std::int64_t keptBytes = std::int64_t{64} * 1024 * 1024;
 
 /// Writes the change down, and returns its id. Thread-safe, as the others.
 Result<std::int64_t> recordChange(const ChangeRecord& change);
+
+/// Whether a change could be written down now, other than for a full disk.
+Result<> checkHistoryCanBeWritten();
 
 /// What became of the change. No error when it is not kept any more.
 Result<> setChangeState(std::int64_t id, ChangeState state);

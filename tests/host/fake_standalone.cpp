@@ -325,7 +325,7 @@ Result<> logEvent(int category, int level, unsigned event, const std::array<cons
 }
 
 std::string changeStateName(ChangeState state) {
-    constexpr std::array<const char*, 4> names{"done", "waiting", "confirmed", "undone"};
+    constexpr std::array<const char*, 5> names{"done", "waiting", "confirmed", "undone", "superseded"};
     return names.at(static_cast<std::size_t>(state));
 }
 

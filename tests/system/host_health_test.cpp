@@ -173,6 +173,22 @@ TEST_F(HostHealth, FilesThatKeepEverybodyOutAreFound) {
     EXPECT_EQ(diagnosis(), "");
 }
 
+TEST_F(HostHealth, ALogThatIsDamagedIsFoundAndPutAside) {
+    const std::string log = worldRoot / "var/lib/velt/log.db";
+    EXPECT_EQ(diagnosis(), "");
+    for (const char* each : {"", "-wal", "-shm"}) {
+        fs::remove(log + each);
+    }
+    writeFile(log, std::string(5000, 'x'));
+    const std::string found = diagnosis();
+    EXPECT_TRUE(contains(found, "log-unusable: ")) << found;
+    EXPECT_EQ(veltctl({"log"}).exitCode, 5);
+    mend(found, "log-unusable");
+    EXPECT_EQ(diagnosis(), "");
+    done({"ftp", "set", "timeout=444"});
+    EXPECT_TRUE(contains(done({"history"}), "/ftp/timeout"));
+}
+
 TEST_F(HostHealth, ADaemonThatWasKilledIsInTheLogAndInTheEvents) {
     done({"ftp", "set", "enable_ftp=on"});
     done({"sftp", "set", "enable=on"});

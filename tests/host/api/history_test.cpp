@@ -114,6 +114,39 @@ TEST_F(HostHistory, WhatWaitedAtTheEndOfVeltdIsTakenBackByTheNext) {
     EXPECT_TRUE(velt::test::waitUntil([&] { return timeOut() == 300; }, velt::test::patience));
 }
 
+TEST_F(HostHistory, AnUnconfirmedChangeThatCannotBeTakenBackIsNotSaidToBe) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    access.commitFails = true;
+    access.sentence = "No luck.";
+    EXPECT_TRUE(velt::test::waitUntil([&] { return logged("cannot take back the unconfirmed change 1: "); },
+                                      velt::test::patience));
+    EXPECT_EQ(get("/api/history/1").json()["state"], "waiting");
+    EXPECT_EQ(access.audit.size(), 1U) << access.audit.back();
+}
+
+TEST_F(HostHistory, AnUnconfirmedChangeThatIsChangedAgainIsSuperseded) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    ASSERT_EQ(setTimeOut(601).status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "superseded"; },
+                                      velt::test::patience));
+    EXPECT_EQ(access.audit.back(), "1: /ftp/timeout was");
+    EXPECT_EQ(timeOut(), 601);
+    EXPECT_EQ(access.history.size(), 2U) << "nothing was undone";
+}
+
+TEST_F(HostHistory, WhatIsLeftOfAnUnconfirmedChangeIsTakenBack) {
+    ASSERT_EQ(ask("PATCH", "/api/settings?confirm_within=1", admin,
+                  R"({"ftp":{"timeout":600},"sftp":{"portnum":2222}})")
+                  .status,
+              200);
+    ASSERT_EQ(setTimeOut(601).status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "undone"; },
+                                      velt::test::patience));
+    EXPECT_EQ(access.audit.back(), "1: , but for /ftp/timeout, changed again since");
+    EXPECT_EQ(timeOut(), 601);
+    EXPECT_EQ(get("/api/settings").json()["sftp"]["portnum"], 22);
+}
+
 TEST_F(HostHistory, AnUnconfirmedChangeThatIsDamagedEndsNothing) {
     ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
     access.damageChange(1);
