@@ -1,6 +1,6 @@
 // What the platform library offers the program that loads the module over it, beside the contract.
 //
-// A host, at its start: openState, the subscriptions, undoUnfinishedChange, startEnabledServices,
+// A host, at its start: openState, the subscriptions, undoUnfinishedChange, startServicesAtBoot,
 // watchServices. Then, for each request, on the thread that serves it: setRequestActor, clearLastError,
 // around one that changes something a SettingsChange, the module's entry function, and after a failure
 // lastErrorSentence or lastPortConflict for the answer.

@@ -21,11 +21,12 @@ struct Wording {
 };
 
 /// In the order of Incident::Kind.
-constexpr std::array<Wording, 4> wordings{{
+constexpr std::array<Wording, 5> wordings{{
     {0x11BF0010, "ended"},
     {0x11BF0011, "recovered"},
     {0x11BF0012, "started"},
     {0x11BF0013, "stopped"},
+    {0x11BF0014, "failed"},
 }};
 
 void complain(const Result<>& outcome) {

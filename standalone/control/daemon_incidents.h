@@ -17,10 +17,11 @@ struct Incident {
         recovered, ///< it serves again after that, or after a failed start
         started,   ///< by another program
         stopped,   ///< by another program
+        failed,    ///< its start, when veltd began
     };
 
     Kind kind = Kind::ended;
-    std::string reason; ///< of an end: a part of a sentence
+    std::string reason; ///< of an end, or a failure: a part of a sentence
 
     bool operator==(const Incident&) const = default;
 };

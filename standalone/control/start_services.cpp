@@ -1,6 +1,8 @@
 #include "standalone/control/start_services.h"
 
+#include "base/text.h"
 #include "standalone/control/daemon_control.h"
+#include "standalone/control/daemon_incidents.h"
 #include "standalone/control/service_firewall.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
@@ -49,11 +51,25 @@ Result<> startIfOn(const Daemon& daemon) {
     return settings.enabled() ? followSettings(daemon) : Result<>();
 }
 
+Result<> followAndRecord(const Daemon& daemon) {
+    auto followed = followSettings(daemon);
+    if (!followed) {
+        recordIncident(daemon,
+                       {Incident::Kind::failed, std::string(trimmedEnd(followed.error().message, ". "))});
+    }
+    return followed;
+}
+
 } // namespace
 
 Result<> startEnabledServices() {
     followWithFirewall(); // its rules went with the boot as well
     return forEachDaemon(followSettings);
+}
+
+Result<> startServicesAtBoot() {
+    followWithFirewall();
+    return forEachDaemon(followAndRecord);
 }
 
 Result<> stopServices() {

@@ -15,6 +15,10 @@ namespace velt {
 /// starting; each failure goes to syslog, and the first one is returned.
 Result<> startEnabledServices();
 
+/// The same when nobody has asked for it, at the start of the host: failures go to the administrator log as
+/// well, where those of a request have its answer.
+Result<> startServicesAtBoot();
+
 /// Ends the daemons and their sessions. The settings stay as they are stored, so that startEnabledServices
 /// starts the same ones again. Failures are treated in the same way.
 Result<> stopServices();

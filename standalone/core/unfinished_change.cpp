@@ -23,7 +23,7 @@ constexpr std::string_view absent = "absent";
 constexpr mode_t noteMode = 0600; // it holds what the files hold
 
 // Changes of this process.
-std::atomic<int> atWork{0};
+std::atomic<unsigned> atWork{0};
 std::atomic<unsigned> begun{0};
 
 std::filesystem::path noteFile() {
@@ -98,6 +98,10 @@ ChangeAtWork::ChangeAtWork() {
 
 ChangeAtWork::~ChangeAtWork() {
     --atWork;
+}
+
+ChangeCount changeCount() {
+    return {begun, atWork};
 }
 
 bool changeWasLeft() {

@@ -29,6 +29,13 @@ public:
     ChangeAtWork& operator=(const ChangeAtWork&) = delete;
 };
 
+/// The changes on which this process was at work so far. Thread-safe.
+struct ChangeCount {
+    unsigned begun = 0;
+    unsigned atWork = 0; ///< and is now
+};
+ChangeCount changeCount();
+
 /// Whether there is a note on which this process is not at work: of a change that could not be undone, or not
 /// wholly. Thread-safe.
 bool changeWasLeft();

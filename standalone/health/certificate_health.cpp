@@ -60,6 +60,11 @@ Finding unusable(const Error& reason) {
     const KeyOwner key = readKey(keyFile);
     const bool mismatch = certificate && key && X509_check_private_key(certificate.get(), key.get()) != 1;
     ERR_clear_error();
+    const std::string close = closeKeyCommand(keyFile);
+    if (!mismatch && !close.empty()) {
+        return finding("certificate-unusable", Severity::error, reason.message,
+                       close + " && veltctl restart ftp");
+    }
     if (!mismatch) {
         return finding("certificate-unusable", Severity::error, reason.message,
                        "Put a certificate and its key in place, then run: veltctl restart ftp");

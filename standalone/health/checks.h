@@ -13,6 +13,12 @@ using TimePoint = std::chrono::system_clock::time_point;
 /// Enabled services that are down or run with former settings, with the reason.
 Findings serviceFindings();
 
+/// Services that run with something else than what is stored. What changes meanwhile is not judged.
+Findings settingsInForceFindings();
+
+/// The id of these findings.
+inline constexpr std::string_view settingsNotInForce = "settings-not-in-force";
+
 /// A change that failed and could not be taken back, or not wholly.
 Findings changeFindings();
 

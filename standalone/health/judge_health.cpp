@@ -6,6 +6,8 @@
 #include <array>
 #include <exception>
 #include <iterator>
+#include <set>
+#include <string>
 
 namespace velt {
 namespace {
@@ -13,6 +15,19 @@ namespace {
 Finding failedCheck(const std::exception& error) {
     return {"check-failed", Severity::warning, "host", std::string("A check failed: ") + error.what() + ".",
             "veltctl doctor"};
+}
+
+/// A service that does not run with what is stored has a reason, which another finding may tell better.
+void dropExplained(Findings& all) {
+    std::set<std::string> explained;
+    for (const Finding& each : all) {
+        if (each.id != settingsNotInForce && each.severity != Severity::notice) {
+            explained.insert(each.subject);
+        }
+    }
+    std::erase_if(all, [&](const Finding& each) {
+        return each.id == settingsNotInForce && explained.contains(each.subject);
+    });
 }
 
 } // namespace
@@ -24,6 +39,7 @@ Findings judgeHealth() {
         Check{[] { return journalFindings(std::chrono::system_clock::now()); }},
         Check{serviceFindings},
         Check{greetingFindings},
+        Check{settingsInForceFindings},
         Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},
         Check{fileFindings},
         Check{firewallFindings},
@@ -41,6 +57,7 @@ Findings judgeHealth() {
             all.push_back(failedCheck(error)); // the others still tell what they find
         }
     }
+    dropExplained(all);
     std::ranges::stable_sort(all, std::ranges::greater(), &Finding::severity);
     return all;
 }

@@ -1,8 +1,12 @@
 #include "standalone/control/service_overview.h"
+#include "standalone/control/start_failure.h"
 #include "standalone/control/supervised_daemon.h"
+#include "standalone/core/error_number.h"
+#include "standalone/core/unfinished_change.h"
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/health/checks.h"
 #include "standalone/health/greeting.h"
+#include "standalone/ports/port_probe.h"
 #include "standalone/process/replaced_programs.h"
 
 #include <unistd.h>
@@ -121,19 +125,78 @@ Findings greetingFindingsOf(const Daemon& daemon) {
     return found;
 }
 
+bool isPortTaken(const Daemon& daemon, const DaemonSettings& settings) {
+    std::vector<int> ports;
+    for (const DaemonPorts& each : settings.ports) {
+        if (!each.ofSessions) {
+            ports.push_back(each.range.first);
+        }
+    }
+    const DaemonState state = daemonState(daemon);
+    const auto free = probePorts(ports, isAlive(state.daemon) ? state.daemon.pid : 0);
+    return !free && free.error().number == ErrorNumber::portTaken;
+}
+
+/// A restart, after what it could not do without.
+std::string mendOf(const Daemon& daemon) {
+    const auto settings = daemon.settings();
+    if (!settings) {
+        return "Correct the file, then run: " + restartOf(daemon);
+    }
+    return (isPortTaken(daemon, *settings)
+                ? "End the program that has the port, or choose another port, then run: "
+                : "") +
+           restartOf(daemon);
+}
+
+Finding finding(const ServiceDown& down) {
+    const bool serves = down.servesFormerSettings;
+    const auto daemons = allDaemons();
+    const auto* const daemon =
+        *std::ranges::find(daemons, down.service, [](const Daemon* each) { return each->apiName; });
+    return {serves ? "service-former-settings" : "service-down", serves ? Severity::warning : Severity::error,
+            down.service,
+            "The " + down.label + " service " +
+                (serves ? "runs with its former settings. " : "does not run. ") + down.reason,
+            mendOf(*daemon)};
+}
+
+/// Whether it runs with something else than what a start now would give it.
+bool followsOther(const Daemon& daemon) {
+    const auto settings = daemon.settings();
+    const DaemonState state = daemonState(daemon);
+    if (!settings || !settings->enabled() || !isServing(state) || startFailure(daemon)) {
+        return false;
+    }
+    const auto hash = daemon.test();
+    return hash && *hash != state.configurationHash;
+}
+
 } // namespace
 
 Findings serviceFindings() {
     Findings findings;
     for (const ServiceDown& down : servicesDown()) {
-        const bool serves = down.servesFormerSettings;
-        findings.push_back({serves ? "service-former-settings" : "service-down",
-                            serves ? Severity::warning : Severity::error, down.service,
-                            "The " + down.label + " service " +
-                                (serves ? "runs with its former settings. " : "does not run. ") + down.reason,
-                            "veltctl restart " + down.service});
+        findings.push_back(finding(down));
     }
     return findings;
+}
+
+Findings settingsInForceFindings() {
+    Findings findings;
+    const ChangeCount before = changeCount();
+    for (const Daemon* daemon : allDaemons()) {
+        if (followsOther(*daemon)) {
+            findings.push_back({std::string(settingsNotInForce), Severity::warning,
+                                std::string(daemon->apiName),
+                                "The " + std::string(daemon->label) +
+                                    " service does not run with the settings that are stored, as after an "
+                                    "edit of its file by hand.",
+                                restartOf(*daemon)});
+        }
+    }
+    const ChangeCount after = changeCount(); // what is being changed is not in force yet
+    return before.atWork == 0 && before.begun == after.begun ? findings : Findings();
 }
 
 Findings greetingFindings() {

@@ -113,25 +113,6 @@ private:
     bool committed_ = false;
 };
 
-/// The rule of a line as the fake platform stores them: "user:1000:/public".
-velt::ChrootRule ruleIn(const std::string& line) {
-    const auto first = line.find(':');
-    const auto second = line.find(':', first + 1);
-    const std::string number = line.substr(first + 1, second - first - 1);
-    return {line.starts_with("user"), static_cast<unsigned>(std::stoul(number)), line.substr(second + 1)};
-}
-
-bool hasName(const velt::ChrootRule& rule) {
-    const auto& platform = fake::Platform::instance();
-    if (rule.isUser) {
-        return std::ranges::any_of(platform.users, [&](const auto& each) {
-            return static_cast<unsigned>(each.second.uid) == rule.id;
-        });
-    }
-    return std::ranges::any_of(
-        platform.groups, [&](const auto& each) { return static_cast<unsigned>(each.second) == rule.id; });
-}
-
 } // namespace
 
 FakeStandalone& FakeStandalone::instance() {
@@ -165,31 +146,6 @@ Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::
         return Error(fake.sentence);
     }
     return fake.sessions;
-}
-
-Result<RulesByName> countRulesByName() {
-    RulesByName found;
-    std::size_t place = 0;
-    for (const std::string& line : fake::Platform::instance().rules) {
-        const ChrootRule rule = ruleIn(line);
-        if (hasName(rule)) {
-            ++found.named;
-        } else {
-            found.unnamed.push_back({place, rule});
-        }
-        ++place;
-    }
-    return found;
-}
-
-Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules) {
-    auto& stored = fake::Platform::instance().rules;
-    for (const auto& [place, rule] : rules) {
-        const auto at = static_cast<std::ptrdiff_t>(std::min(place, stored.size()));
-        stored.insert(stored.begin() + at,
-                      (rule.isUser ? "user:" : "group:") + std::to_string(rule.id) + ":" + rule.path);
-    }
-    return {};
 }
 
 ServiceRequest::ServiceRequest(SessionPolicy) {}

@@ -63,6 +63,38 @@ TEST_F(HostHealth, AKeyOfAnotherCertificateKeepsEverybodyOut) {
     EXPECT_EQ(diagnosis(), "");
 }
 
+TEST_F(HostHealth, AKeyThatIsOpenToOthersIsFound) {
+    const Certificate good = makeCertificate();
+    putInPlace(good.text, good.key);
+    done({"ftp", "set", "enable_ftps=on"});
+    const std::string key = worldRoot / "etc/velt/tls/server.key";
+    ASSERT_EQ(::chmod(key.c_str(), 0644), 0);
+    const std::string found = diagnosis();
+    EXPECT_EQ(found, "certificate-unusable: chmod 640 " + key + " && veltctl restart ftp\n");
+    mend(found, "certificate-unusable");
+    EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, SettingsThatWereEditedByHandAreFound) {
+    done({"ftp", "set", "enable_ftp=on", "timeout=400"});
+    const fs::path file = worldRoot / "etc/velt/ftp.conf";
+    std::string text = contentsOf(file);
+    const auto place = text.find("timeout = 400");
+    ASSERT_NE(place, std::string::npos) << text;
+    writeFile(file, text.replace(place, 13, "timeout = 500"));
+    std::string found = diagnosis();
+    EXPECT_EQ(found, "settings-not-in-force: veltctl restart ftp\n");
+    mend(found, "settings-not-in-force");
+    EXPECT_EQ(diagnosis(), "");
+    writeFile(file, "nonsense\n");
+    found = diagnosis();
+    EXPECT_EQ(found, "service-former-settings: Correct the file, then run: veltctl restart ftp\n");
+    EXPECT_NE(veltctl({"restart", "ftp"}).exitCode, 0) << "the file is to be corrected first";
+    writeFile(file, text);
+    mend(found, "service-former-settings");
+    EXPECT_EQ(diagnosis(), "");
+}
+
 TEST_F(HostHealth, AStartThatFailedAtTheBootIsMadeUpFor) {
     done({"ftp", "set", "enable_ftp=on"});
     done({"sftp", "set", "enable=on"});
@@ -76,8 +108,13 @@ TEST_F(HostHealth, AStartThatFailedAtTheBootIsMadeUpFor) {
         const TakenPort further(2222, TakenPort::As::bound);
         startHost();
         found = diagnosis();
-        EXPECT_EQ(found, "service-down: veltctl restart ftp\nservice-down: veltctl restart sftp\n");
+        const std::string hint = "End the program that has the port, or choose another port, then run: ";
+        EXPECT_EQ(found, "service-down: " + hint + "veltctl restart ftp\nservice-down: " + hint +
+                             "veltctl restart sftp\n");
         EXPECT_TRUE(contains(veltctl({"status"}).output, "2 errors: see 'veltctl doctor'."));
+        const std::string log = done({"log"});
+        EXPECT_TRUE(contains(log, "The FTP service is on, but could not be started: Port 2121 is in use by "))
+            << log;
         const ProcessResult inVain = veltctl({"restart", "ftp"});
         EXPECT_NE(inVain.exitCode, 0);
         EXPECT_TRUE(contains(inVain.errors, "Port 2121 is in use by system-host-tes")) << inVain.errors;

@@ -43,6 +43,14 @@ KeyOwner parseKey(const std::string& text) {
     return KeyOwner(bio ? PEM_read_bio_PrivateKey(bio.get(), nullptr, noPassphrase, nullptr) : nullptr);
 }
 
+bool isOthers(const struct stat& facts) {
+    return facts.st_uid != 0 && facts.st_uid != geteuid();
+}
+
+bool isOpen(const struct stat& facts) {
+    return (facts.st_mode & (S_IRWXO | S_IWGRP)) != 0;
+}
+
 Error refuse(const std::filesystem::path& file, const std::string& why) {
     ERR_clear_error();
     return {ErrorNumber::invalid, file.string() + " " + why + "."};
@@ -82,13 +90,11 @@ Result<> checkPrivate(const std::filesystem::path& key) {
     if (::stat(key.c_str(), &facts) != 0) {
         return refuse(key, "cannot be read");
     }
-    if (facts.st_uid != 0 && facts.st_uid != geteuid()) {
-        return refuse(key, "belongs to another user; mend it with: chown root " + key.string());
+    if (isOthers(facts)) {
+        return refuse(key, "belongs to another user; mend it with: " + closeKeyCommand(key));
     }
-    if ((facts.st_mode & (S_IRWXO | S_IWGRP)) != 0) {
-        return refuse(key, "is open to other users; mend it with: chmod 640 " + key.string());
-    }
-    return {};
+    return isOpen(facts) ? refuse(key, "is open to other users; mend it with: " + closeKeyCommand(key))
+                         : Result<>();
 }
 
 Result<ServerCertificate> loadGiven(const Pair& pair) {
@@ -144,6 +150,17 @@ Result<bool> isThere(const Pair& pair) {
 }
 
 } // namespace
+
+std::string closeKeyCommand(const std::filesystem::path& key) {
+    struct stat facts {};
+    if (::stat(key.c_str(), &facts) != 0) {
+        return "";
+    }
+    if (isOthers(facts)) {
+        return "chown root " + key.string();
+    }
+    return isOpen(facts) ? "chmod 640 " + key.string() : "";
+}
 
 Result<ServerCertificate> serverCertificate() {
     const Pair given = givenPair();

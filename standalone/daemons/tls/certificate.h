@@ -34,6 +34,9 @@ Result<ServerCertificate> serverCertificate();
 /// given or made. Thread-safe.
 Result<std::optional<ServerCertificate>> storedCertificate();
 
+/// What takes a key from those who must not have it; "" where that is not needed, or the key is missing.
+std::string closeKeyCommand(const std::filesystem::path& key);
+
 } // namespace velt
 
 #endif

@@ -46,7 +46,8 @@ TEST_F(ServiceHealth, AMoveToAPortThatIsBoundAndDoesNotListenIsNamed) {
     const Findings found = serviceFindings();
     EXPECT_EQ(summary(found), "warning service-former-settings");
     EXPECT_NE(found.at(0).sentence.find(std::to_string(ftpPort_)), std::string::npos) << found.at(0).sentence;
-    EXPECT_EQ(found.at(0).mend, "veltctl restart ftp");
+    EXPECT_EQ(found.at(0).mend,
+              "End the program that has the port, or choose another port, then run: veltctl restart ftp");
     ::close(other);
 }
 
