@@ -1,5 +1,6 @@
 #include "standalone/change/change_program.h"
 
+#include "standalone/control/bring_daemons.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
@@ -29,15 +30,6 @@ constexpr std::array storedFiles{
     StoredFile{paths::chrootRules, "chroot rules"},
     StoredFile{paths::systemInformation, "system information"},
 };
-
-/// Whether the daemon listens on a port that the other is to have.
-bool isInTheWay(const Daemon& daemon, const Daemon& other) {
-    const auto wanted = other.settings();
-    const auto ports = daemonState(daemon).ports;
-    return wanted && std::ranges::any_of(wanted->ports, [&](const DaemonPorts& each) {
-               return !each.ofSessions && std::ranges::count(ports, each.range.first) != 0;
-           });
-}
 
 ProgramStep storeStep(const StagedFile& file) {
     const std::string subject = subjectOf(file);

@@ -1,10 +1,10 @@
 #include "standalone/change/run_change.h"
 
+#include "standalone/control/bring_daemons.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/service_firewall.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
-#include "standalone/core/error_number.h"
 #include "standalone/core/unfinished_change.h"
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/firewall/firewall_table.h"
@@ -55,38 +55,15 @@ Result<> bringBack(const Daemon& daemon, RunState former) {
     });
 }
 
-/// Of the daemons that wait for a port, one that can goes out of the way. False when there is none.
-bool makeRoom(const FormerStates& waiting) {
-    return std::ranges::any_of(waiting, [](const auto& each) {
-        const Daemon& daemon = *each.first;
-        return daemon.canPause && isServing(daemonState(daemon)) &&
-               perform(Effect::stop, daemon.name, [&] { return pauseDaemon(daemon); });
-    });
-}
-
-/// One may still hold the port that another had, so those that find it taken are tried again after the
-/// others. Goes on after another failure, and returns the first.
-Result<> bringBackDaemons(FormerStates former) {
-    Result<> outcome;
-    while (!former.empty()) {
-        FormerStates waiting;
-        Result<> taken;
-        for (const auto& [daemon, state] : former) {
-            auto done = bringBack(*daemon, state);
-            if (!done && done.error().number == ErrorNumber::portTaken) {
-                waiting[daemon] = state;
-                keepFirst(taken, std::move(done));
-            } else {
-                keepFirst(outcome, std::move(done));
-            }
-        }
-        if (waiting.size() == former.size() && !makeRoom(waiting)) {
-            keepFirst(outcome, std::move(taken));
-            break;
-        }
-        former = std::move(waiting);
+/// Goes on after a failure, and returns the first.
+Result<> bringBackDaemons(const FormerStates& former) {
+    std::vector<const Daemon*> daemons;
+    for (const auto& [daemon, state] : former) {
+        daemons.push_back(daemon);
     }
-    return outcome;
+    const auto failures =
+        bringDaemons(daemons, [&](const Daemon& daemon) { return bringBack(daemon, former.at(&daemon)); });
+    return failures.empty() ? Result<>() : Result<>(failures.front().error);
 }
 
 /// The change on the disk, to be undone after a crash. Where nothing is stored there is nothing to note.

@@ -1,6 +1,7 @@
 #include "standalone/control/start_services.h"
 
 #include "base/text.h"
+#include "standalone/control/bring_daemons.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/daemon_incidents.h"
 #include "standalone/control/service_firewall.h"
@@ -51,25 +52,32 @@ Result<> startIfOn(const Daemon& daemon) {
     return settings.enabled() ? followSettings(daemon) : Result<>();
 }
 
-Result<> followAndRecord(const Daemon& daemon) {
-    auto followed = followSettings(daemon);
-    if (!followed) {
-        recordIncident(daemon,
-                       {Incident::Kind::failed, std::string(trimmedEnd(followed.error().message, ". "))});
+std::vector<DaemonFailure> followAll() {
+    followWithFirewall(); // its rules went with the boot as well
+    const auto daemons = allDaemons();
+    auto failures = bringDaemons({daemons.begin(), daemons.end()}, followSettings);
+    for (const DaemonFailure& each : failures) {
+        ::syslog(LOG_ERR, "%s", each.error.message.c_str());
     }
-    return followed;
+    return failures;
+}
+
+Result<> firstOf(const std::vector<DaemonFailure>& failures) {
+    return failures.empty() ? Result<>() : Result<>(failures.front().error);
 }
 
 } // namespace
 
 Result<> startEnabledServices() {
-    followWithFirewall(); // its rules went with the boot as well
-    return forEachDaemon(followSettings);
+    return firstOf(followAll());
 }
 
 Result<> startServicesAtBoot() {
-    followWithFirewall();
-    return forEachDaemon(followAndRecord);
+    const auto failures = followAll();
+    for (const auto& [daemon, error] : failures) {
+        recordIncident(*daemon, {Incident::Kind::failed, std::string(trimmedEnd(error.message, ". "))});
+    }
+    return firstOf(failures);
 }
 
 Result<> stopServices() {
