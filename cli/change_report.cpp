@@ -197,6 +197,10 @@ void writeReport(Context& context, const Json::Value& report, const std::string&
         out << ended << (ended == 1 ? " session " : " sessions ")
             << (dryRun ? "would be ended.\n" : "ended.\n");
     }
+    if (const std::string deadline = textAt(report, "confirm_by"); !deadline.empty()) {
+        out << "The change is taken back at " << printable(deadline)
+            << " unless you confirm it: veltctl confirm " << textAt(report, "id") << '\n';
+    }
     writeNotes(context, report);
 }
 

@@ -10,6 +10,7 @@ namespace velt::cli {
 namespace {
 
 constexpr int codeShareUnreachable = 1905;
+constexpr const char* historyPath = "/api/history/";
 
 struct Meaning {
     long status;
@@ -24,6 +25,7 @@ constexpr Meaning meanings[] = {
     {405, ExitCode::refused, "The server does not support this method"},
     {408, ExitCode::access, "The server is busy"},
     {409, ExitCode::conflict, "The request conflicts with something else on the server"},
+    {412, ExitCode::conflict, "The settings have changed since they were read"},
     {429, ExitCode::access, "The server is busy"},
 };
 constexpr Meaning otherFailure{500, ExitCode::platform, "The server failed to carry out the request"};
@@ -51,7 +53,23 @@ std::string accessHint(long status, const ServerAddress& server) {
            create;
 }
 
-std::string conflictHint(const Json::Value& problem) {
+/// Of a change in the history that is not as the request takes it to be; "" for another conflict, such as a
+/// port that an undoing would need.
+std::string historyHint(const Json::Value& problem, const std::string& path) {
+    const bool ofSettings = problem.isMember("code") || problem.isMember("holder");
+    if (!path.starts_with(historyPath) || ofSettings) {
+        return "";
+    }
+    if (!problem["errors"].empty()) {
+        return "'veltctl history' lists the later change: undo that one first, or set by hand what you want.";
+    }
+    return problem.isMember("changed") ? "" : "'veltctl history' tells the state of each change.";
+}
+
+std::string conflictHint(const Json::Value& problem, const std::string& path) {
+    if (const std::string hint = historyHint(problem, path); !hint.empty()) {
+        return hint;
+    }
     if (problem["code"] == codeShareUnreachable) {
         return "Choose another share ('veltctl shares' lists them), let the account ftp read this one, or "
                "switch anonymous_chroot off.";
@@ -60,7 +78,11 @@ std::string conflictHint(const Json::Value& problem) {
 }
 
 // A refusal of the module says whether anything was changed, unless its method only reads.
-std::string failureHint(const Json::Value& problem, bool reads) {
+std::string failureHint(const Json::Value& problem, const AskedFor& asked) {
+    if (asked.path.starts_with("/api/restart")) { // settings stay as they are
+        return "Fix the problem that the server names, then try again; 'veltctl status' shows what runs.";
+    }
+    const bool reads = asked.method == "GET";
     const bool changed =
         problem["changed"].isBool() ? problem["changed"].asBool() : !reads && !problem.isMember("code");
     return changed ? "Part of the change may be in effect: check 'veltctl status' and 'veltctl log'. The "
@@ -68,11 +90,18 @@ std::string failureHint(const Json::Value& problem, bool reads) {
                    : "Fix the problem that the server names, then try again.";
 }
 
+/// What is wrong need not be in what was sent: a certificate may not fit its key.
+std::string refusalHint(const Json::Value& problem) {
+    const bool ofServer = problem.isMember("code") && problem["errors"].empty();
+    return ofServer ? "Mend what the server names, then try again. 'veltctl doctor' may know the command."
+                    : "Correct the input and try again.";
+}
+
 std::string absenceHint(const std::string& path) {
     if (path.starts_with("/api/bans/")) {
         return "'veltctl bans list' lists the bans.";
     }
-    if (path.starts_with("/api/history/") || path == "/api/diff") {
+    if (path.starts_with(historyPath) || path == "/api/diff") {
         return "'veltctl history' lists the changes.";
     }
     return path.starts_with("/api/tokens/") ? "'veltctl tokens list' lists the tokens."
@@ -92,14 +121,16 @@ std::string hintOf(long status, const Json::Value& problem, const ServerAddress&
     case 429:
         return "Try again in a moment.";
     case 409:
-        return conflictHint(problem);
+        return conflictHint(problem, asked.path);
+    case 412:
+        return "Read them again, and repeat the change.";
     default:
         break;
     }
     if (status >= 500) {
-        return failureHint(problem, asked.method == "GET");
+        return failureHint(problem, asked);
     }
-    return status >= 400 ? "Correct the input and try again." : checkAddress;
+    return status >= 400 ? refusalHint(problem) : checkAddress;
 }
 
 // Adds what the server's detail does not say already.

@@ -13,10 +13,7 @@ std::string numberFacts(const Setting& setting) {
 }
 
 std::string numberExpectation(const Setting& setting) {
-    const std::string range = rangeText(setting);
-    if (range.empty())
-        return "a number";
-    return (setting.most == highestNumber ? "a number, " : "a number from ") + range;
+    return "a number from " + std::to_string(setting.least) + " to " + std::to_string(setting.most);
 }
 
 } // namespace

@@ -22,7 +22,7 @@ inline constexpr BooleanWords trueFalse{"true", "false", "true or false"};
 /// The numbers that are meant: "1 to 65535", "0 or more"; "" where all are.
 std::string rangeText(const Setting& setting);
 
-/// What a value has to be: "a number from 1 to 65535", "a number, 0 or more", "on or off".
+/// What a value has to be: "a number from 1 to 65535", "on or off".
 std::string expectation(const Setting& setting, BooleanWords words);
 
 /// What there is to know about the values: "seconds, 0 to 86400, default 300".

@@ -2,6 +2,7 @@
 
 #include "base/json_value.h"
 #include "base/text.h"
+#include "base/utc_text.h"
 #include "host/api/audit.h"
 #include "host/api/change_summary.h"
 #include "host/api/problem.h"
@@ -44,6 +45,9 @@ Json::Value toObject(const ChangeReport& report) {
          {"down", jsonArray(report.down, [](const ServiceDown& each) { return toObject(each); })}});
     if (report.id) {
         object["id"] = Json::Int64{*report.id};
+    }
+    if (report.confirmBy) {
+        object["confirm_by"] = timestamp(*report.confirmBy);
     }
     return object;
 }
@@ -145,6 +149,7 @@ Result<> Changes::record(const ChangeRequest& request, ChangeState state, Change
         change.confirmBy = change.time + *request.options.confirmWithin;
     }
     VELT_ASSIGN_OR_RETURN(report.id, recordChange(change));
+    report.confirmBy = change.confirmBy;
     return {};
 }
 

@@ -13,6 +13,7 @@
 
 #include <json/value.h>
 
+#include <chrono>
 #include <cstdint>
 #include <functional>
 #include <optional>
@@ -39,11 +40,12 @@ struct ChangeReport {
     std::vector<std::string> warnings;
     std::vector<ServiceDown> down;  ///< services that are on and do not run, for reasons of their own
     std::optional<std::int64_t> id; ///< in the history
+    std::optional<std::chrono::system_clock::time_point> confirmBy; ///< else it is taken back
 
     bool empty() const { return changes.empty() && steps.empty(); }
 };
 
-/// {"changes", "effects", "sessions_ended", "warnings", "down", "id"}
+/// {"changes", "effects", "sessions_ended", "warnings", "down", "id", "confirm_by"}
 Json::Value toObject(const ChangeReport& report);
 
 /// The answer to a dry run of something that is not a change of settings.

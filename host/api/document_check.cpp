@@ -25,7 +25,7 @@ using Errors = std::vector<FieldError>;
 constexpr int lowestPassivePort = 1024;
 
 std::string pointer(const std::string& section, const std::string& key) {
-    return "/" + section + "/" + key;
+    return "/" + section + "/" + pointerToken(key);
 }
 
 Json::Value defaultOf(const Setting& setting) {
@@ -61,16 +61,27 @@ void patchSection(const schema::SettingGroup& group, const Json::Value& patch, J
     }
 }
 
+/// Not 1e2 or 100.0, though they are this number: modules take none of them.
+bool isInDigits(const Json::Value& value) {
+    return value.type() == Json::intValue || value.type() == Json::uintValue;
+}
+
 bool hasType(const Json::Value& value, SettingType type) {
     switch (type) {
     case SettingType::boolean:
         return value.isBool();
     case SettingType::number:
-        return value.isInt();
+        return value.isInt() && isInDigits(value);
     case SettingType::text:
         break;
     }
     return value.isString() && std::ranges::none_of(value.asString(), isControl);
+}
+
+std::string expectationFor(const Setting& setting, const Json::Value& value) {
+    const bool isNumber = setting.type == SettingType::number && value.isInt() && !isInDigits(value);
+    return schema::expectation(setting, schema::trueFalse) +
+           (isNumber ? ", in digits without fraction or exponent" : "");
 }
 
 bool isInRange(const Setting& setting, const Json::Value& value) {
@@ -169,8 +180,7 @@ void checkSection(const schema::SettingGroup& group, const Json::Value& wanted, 
         const Json::Value& value = wanted[setting->key];
         const bool unchanged = wanted.isMember(setting->key) && value == current[setting->key];
         if (!unchanged && (!hasType(value, setting->type) || !isInRange(*setting, value))) {
-            errors.push_back(
-                {pointer(group.name, setting->key), schema::expectation(*setting, schema::trueFalse)});
+            errors.push_back({pointer(group.name, setting->key), expectationFor(*setting, value)});
         }
     }
     for (const std::string& key : wanted.getMemberNames()) {
@@ -187,7 +197,7 @@ std::optional<FieldError> faultOfRule(const Json::Value& rule, const std::string
     }
     for (const std::string& key : rule.getMemberNames()) {
         if (key != "type" && key != "name" && key != "path") {
-            return FieldError{std::string(place).append("/").append(key), "only type, name and path"};
+            return FieldError{place + "/" + pointerToken(key), "only type, name and path"};
         }
     }
     const auto text = [&](const char* key) { return rule[key].isString() ? rule[key].asString() : ""; };
@@ -237,7 +247,7 @@ std::string sectionNames(const Json::Value& document) {
 void checkTop(const Json::Value& wanted, const Json::Value& current, Errors& errors) {
     for (const std::string& name : wanted.getMemberNames()) {
         if (!current.isMember(name)) {
-            errors.push_back({"/" + name, "one of the sections " + sectionNames(current)});
+            errors.push_back({"/" + pointerToken(name), "one of the sections " + sectionNames(current)});
         }
     }
     for (const char* const name : {"format", "format_version"}) {

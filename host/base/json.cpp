@@ -44,4 +44,12 @@ std::string toJson(const Json::Value& value) {
     return findInvalidUtf8(text) == std::string_view::npos ? text : repaired(text);
 }
 
+std::string pointerToken(const std::string& name) {
+    std::string token;
+    for (const char character : name) {
+        token += character == '~' ? "~0" : character == '/' ? "~1" : std::string(1, character);
+    }
+    return token;
+}
+
 } // namespace velt::host

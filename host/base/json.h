@@ -19,6 +19,9 @@ Result<Json::Value> parseObject(std::string_view text);
 /// the replacement character.
 std::string toJson(const Json::Value& value);
 
+/// A member's name as a part of a JSON Pointer (RFC 6901).
+std::string pointerToken(const std::string& name);
+
 } // namespace velt::host
 
 #endif

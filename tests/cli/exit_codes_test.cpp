@@ -62,6 +62,48 @@ TEST_F(ExitCodesTest, RefusedInput) {
 TEST_F(ExitCodesTest, Conflict) {
     EXPECT_EQ(codeAfter(409), 4);
     EXPECT_NE(last.err.find("Choose another port"), std::string::npos);
+    EXPECT_EQ(codeAfter(412), 4);
+    EXPECT_NE(last.err.find("Read them again"), std::string::npos);
+}
+
+TEST_F(ExitCodesTest, EachConflictHasItsOwnAdvice) {
+    const auto adviceAfter = [&](const std::string& path, const Words& words, const char* problem) {
+        host.answerWith("POST " + path, problemReply(409, problem));
+        EXPECT_EQ(codeOf(words), 4);
+        return last.err.substr(last.err.find("What to do: "));
+    };
+    const std::string undo = "/api/history/7/undo";
+    EXPECT_EQ(
+        adviceAfter(undo, {"undo", "7"},
+                    R"({"detail": "/ftp/timeout was changed again since. Nothing was changed.",
+                              "changed": false, "errors": [{"field": "/ftp/timeout", "expected": "600"}]})"),
+        "What to do: 'veltctl history' lists the later change: undo that one first, or set by hand what "
+        "you want.\n");
+    EXPECT_EQ(adviceAfter(undo, {"undo", "7"}, R"({"detail": "The change 7 is undone already."})"),
+              "What to do: 'veltctl history' tells the state of each change.\n");
+    EXPECT_EQ(adviceAfter("/api/history/7/confirm", {"confirm", "7"},
+                          R"({"detail": "The change 7 does not wait for a confirmation: it is done."})"),
+              "What to do: 'veltctl history' tells the state of each change.\n");
+    EXPECT_EQ(adviceAfter(undo, {"undo", "7"},
+                          R"({"title": "The FTP port is taken", "code": 1903, "holder": "x", "changed": false,
+                              "errors": [{"field": "/ftp/portnum", "expected": "a free port"}]})"),
+              "What to do: Choose another port, or free this one.\n");
+}
+
+TEST_F(ExitCodesTest, AFailedRestartChangesNothing) {
+    host.answerWith("POST /api/restart?sessions=keep",
+                    problemReply(500, R"({"detail": "The FTP daemon does not start: no luck."})"));
+    EXPECT_EQ(codeOf({"restart"}), 5);
+    EXPECT_EQ(last.err.find("in effect"), std::string::npos) << last.err;
+    EXPECT_NE(last.err.find("'veltctl status' shows what runs"), std::string::npos) << last.err;
+}
+
+TEST_F(ExitCodesTest, WhatIsWrongNeedNotBeTheInput) {
+    host.answerWith(change, problemReply(422, R"({"title": "The settings cannot be like this", "code": 1902,
+        "detail": "The key does not belong to the certificate. Nothing was changed.", "changed": false})"));
+    EXPECT_EQ(codeOf({"ftp", "set", "portnum=2121"}), 3);
+    EXPECT_EQ(last.err.find("Correct the input"), std::string::npos) << last.err;
+    EXPECT_NE(last.err.find("veltctl doctor"), std::string::npos) << last.err;
 }
 
 TEST_F(ExitCodesTest, ThePlatformFailed) {

@@ -54,6 +54,15 @@ TEST_F(HistoryTest, TheNewestIsUndoneUnlessAnotherIsNamed) {
     EXPECT_NE(none.err.find("There is no change to undo."), std::string::npos) << none.err;
 }
 
+TEST_F(HistoryTest, AChangeThatWaitsTellsHowItIsConfirmed) {
+    answer("POST /api/history/11/undo?confirm_within=60",
+           R"({"changes": [{"field": "/ftp/timeout", "from": 600, "to": 300}], "effects": [], "id": 13,
+               "confirm_by": "2026-11-21T08:01:00Z"})");
+    EXPECT_EQ(run({"undo", "11", "--confirm-within", "60"}).out,
+              "ftp/timeout: 600 -> 300\n"
+              "The change is taken back at 2026-11-21T08:01:00Z unless you confirm it: veltctl confirm 13\n");
+}
+
 TEST_F(HistoryTest, TheOneThatWaitsIsConfirmed) {
     host.answerWith("POST /api/history/12/confirm", HttpReply{204, "", "", false, false});
     EXPECT_EQ(run({"confirm"}).out, "Change 12 stays.\n");

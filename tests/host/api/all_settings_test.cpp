@@ -111,6 +111,8 @@ TEST_F(HostSettings, EachFaultIsNamedByItsPlace) {
         {R"({"ftp":{"timeout":-1}})", {"/ftp/timeout"}},
         {R"({"ftp":{"timeout":86401}})", {"/ftp/timeout"}},
         {R"({"ftp":{"maxuploadrate":-1}})", {"/ftp/maxuploadrate"}},
+        {R"({"ftp":{"timeout":3e2}})", {"/ftp/timeout"}},
+        {R"({"ftp":{"a/b~c":1},"d/e":1})", {"/d~1e", "/ftp/a~1b~0c"}},
         {R"({"ftp":{"portnum":70000},"sftp":{"portnum":0}})", {"/ftp/portnum", "/sftp/portnum"}},
         {R"({"ftp":{"enable_ftp":1}})", {"/ftp/enable_ftp"}},
         {R"({"ftp":{"enable_utf8":true}})", {"/ftp/enable_utf8"}},

@@ -84,7 +84,9 @@ TEST_F(HostHistory, WhatWasChangedAgainIsNotUndone) {
 }
 
 TEST_F(HostHistory, AnUnconfirmedChangeIsTakenBack) {
-    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    const Answer made = setTimeOut(600, "?confirm_within=1");
+    ASSERT_EQ(made.status, 200);
+    EXPECT_EQ(made.json()["confirm_by"], get("/api/history/1").json()["confirm_by"]);
     EXPECT_EQ(access.history[0].state, ChangeState::waiting);
     EXPECT_TRUE(velt::test::waitUntil([&] { return timeOut() == 300; }, velt::test::patience));
     EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "undone"; },
