@@ -9,6 +9,7 @@
 
 #include <fcntl.h>
 #include <sys/prctl.h>
+#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -26,6 +27,18 @@ TEST(Processes, AreToldApartByTheirStart) {
     EXPECT_FALSE(isAlive({self->pid, self->startTime + 1}));
     EXPECT_FALSE(isAlive({}));
     EXPECT_FALSE(identifyProcess(-1));
+}
+
+TEST(Processes, MayBeAliveWhileTheyCannotBeLookedAt) {
+    const auto self = identifyProcess(::getpid());
+    ASSERT_TRUE(self);
+    rlimit usual{};
+    ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &usual), 0);
+    const rlimit none{0, usual.rlim_max};
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &none), 0); // no file can be opened
+    const bool alive = isAlive(*self);
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &usual), 0);
+    EXPECT_TRUE(alive) << "who takes it for gone leaves it behind";
 }
 
 TEST(Processes, CannotForgeTheirStartByTheirName) {
