@@ -46,6 +46,10 @@ struct FaultSweep {
 
     Share share = Share::firstAndLast;
 
+    /// Where a run takes long: how many of these there are for one that fails, unless the environment has
+    /// VELT_LOAD=long.
+    std::size_t oneOf = 1;
+
     std::chrono::milliseconds limit{10'000}; ///< for one run; the test fails past it
 };
 
