@@ -10,6 +10,7 @@
 #include "host/base/json.h"
 #include "host/module/platform_request.h"
 
+#include <algorithm>
 #include <functional>
 #include <utility>
 
@@ -27,6 +28,17 @@ HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId)
                                    {"detail", outcome.failure->message + extent},
                                    {"changed", !outcome.undone}}),
                        requestId);
+}
+
+/// What the staged settings make wrong that was not so before.
+std::vector<std::string> warningsBeside(const Findings& known) {
+    std::vector<std::string> warnings;
+    for (const Finding& each : judgeSettings()) {
+        if (std::ranges::find(known, each) == known.end()) {
+            warnings.push_back(each.sentence);
+        }
+    }
+    return warnings;
 }
 
 Json::Value toObject(const ChangeStep& step) {
@@ -66,6 +78,7 @@ std::variant<ChangeReport, HttpResponse> Changes::make(const ChangeRequest& requ
     const Call& call = request.call;
     const PlatformRequest platform(call.principal.actor, call.principal.address);
     const auto before = readSettingsDocument(table_, call.principal);
+    const Findings known = judgeSettings();
     auto change = SettingsChange::begin(request.ports);
     if (!change) {
         return failedUnchanged(change.error().message, call.id);
@@ -80,6 +93,7 @@ std::variant<ChangeReport, HttpResponse> Changes::make(const ChangeRequest& requ
     if (before && after) {
         report.changes = differences(*before, *after);
     }
+    report.warnings = warningsBeside(known);
     if (auto failure =
             request.options.dryRun ? preview(**change, request, report) : commit(**change, request, report)) {
         return std::move(*failure);
@@ -110,7 +124,7 @@ std::optional<HttpResponse> Changes::commit(SettingsChange& change, const Change
     const ChangeOutcome outcome = change.commit(request.options.sessions);
     report.steps = outcome.steps;
     report.sessionsEnded = outcome.sessionsEnded;
-    report.warnings = outcome.warnings;
+    report.warnings.insert(report.warnings.end(), outcome.warnings.begin(), outcome.warnings.end());
     if (outcome.failure) {
         noteFailure(outcome, request, report);
         return notDone(outcome, request.call.id);

@@ -38,6 +38,9 @@ Findings certificateFindings(TimePoint now);
 /// The files of the shares and of the chroot rules, and the accounts that they name.
 Findings fileFindings();
 
+/// Chroot rules for folders of shares that do not exist.
+Findings ruleShareFindings();
+
 /// Whether the packet filter has the rules that the settings ask for, and whether they are of use.
 Findings firewallFindings();
 

@@ -42,6 +42,7 @@ Findings judgeHealth() {
         Check{settingsInForceFindings},
         Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},
         Check{fileFindings},
+        Check{ruleShareFindings},
         Check{firewallFindings},
         Check{passiveRangeFindings},
         Check{externalAddressFindings},
@@ -59,6 +60,14 @@ Findings judgeHealth() {
     }
     dropExplained(all);
     std::ranges::stable_sort(all, std::ranges::greater(), &Finding::severity);
+    return all;
+}
+
+Findings judgeSettings() {
+    Findings all;
+    for (const auto check : {passiveRangeFindings, externalAddressFindings, ruleShareFindings}) {
+        std::ranges::move(check(), std::back_inserter(all));
+    }
     return all;
 }
 

@@ -13,6 +13,11 @@ namespace velt {
 /// alone.
 Findings judgeHealth();
 
+/// What the stored settings make wrong by themselves, or those that this thread has staged: those findings of
+/// judgeHealth that tell of the passive range, the external address and the shares of rules. Takes some
+/// milliseconds. Thread-safe.
+Findings judgeSettings();
+
 } // namespace velt
 
 #endif

@@ -89,11 +89,16 @@ Findings passiveRangeFindings() {
 
 Findings externalAddressFindings() {
     const auto settings = loadFtpSettings();
-    if (!settings || !enablesFtp(settings->record) || settings->record.use_ext_ip == 0 ||
-        settings->externalAddress.empty()) {
+    if (!settings || !enablesFtp(settings->record) || settings->record.use_ext_ip == 0) {
         return {};
     }
     const std::string change = "veltctl ftp set ext_ip=ADDRESS";
+    if (settings->externalAddress.empty()) {
+        return {{"external-address-missing", Severity::notice, "ftp",
+                 "FTP is to give its clients the external address, but there is none: it gives them the "
+                 "address that they connect to.",
+                 change}};
+    }
     if (const auto checked = checkExternalAddress(settings->externalAddress); !checked) {
         return {{"external-address-unreachable", Severity::error, "ftp", checked.error().message, change}};
     }

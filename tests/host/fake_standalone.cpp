@@ -194,6 +194,10 @@ Findings judgeHealth() {
     return fake.findings;
 }
 
+Findings judgeSettings() {
+    return {};
+}
+
 std::string_view severityName(Severity severity) {
     constexpr std::array<std::string_view, 3> names{"notice", "warning", "error"};
     return names.at(static_cast<std::size_t>(severity));

@@ -39,6 +39,26 @@ TEST_F(HostChange, aTakenPortIsFoundByTheDryRunToo) {
     EXPECT_EQ(real.json["detail"], dry.json["detail"]);
 }
 
+TEST_F(HostChange, whatDoctorWouldFindIsAWarningOfThePlan) {
+    done({"ftp", "set", "custom_port_range=on", "custom_port=3000:3100"});
+    const UniqueFd other = listenOn(3005);
+    const std::string body = R"({"ftp": {"enable_ftp": true, "use_ext_ip": true},
+        "chroot_rules": [{"type": "user", "name": "bob", "path": "/attic"}]})";
+    const Json::Value plan = patch(body, "?dry_run=true").json["warnings"];
+    ASSERT_EQ(plan.size(), 3U) << patch(body, "?dry_run=true").body;
+    EXPECT_TRUE(contains(plan[0].asString(), "listens on port 3005, in the passive range")) << textOf(plan);
+    EXPECT_TRUE(contains(plan[1].asString(), "but there is none")) << textOf(plan);
+    EXPECT_TRUE(contains(plan[2].asString(), "There is no share \"attic\"")) << textOf(plan);
+    EXPECT_EQ(patch(body).json["warnings"], plan);
+    const Json::Value health = curl("/api/health").json;
+    for (const Json::Value& each : plan) {
+        EXPECT_TRUE(contains(textOf(health), textOf(each))) << textOf(health);
+    }
+    EXPECT_EQ(patch(R"({"ftp": {"timeout": 411}})", "?dry_run=true").json["warnings"].size(), 0U)
+        << "only what is new";
+    EXPECT_EQ(patch(R"({"chroot_rules": []})").status, 200);
+}
+
 TEST_F(HostChange, anUnconfirmedChangeIsTakenBackByTheNextVeltd) {
     done({"ftp", "set", "enable_ftp=on"});
     const std::string before = exported();

@@ -317,6 +317,24 @@ TEST_F(HandOverTest, AStopEndsTheSessionsOfWhatWasClosed) {
     EXPECT_TRUE(leftProcesses().empty());
 }
 
+TEST_F(HandOverTest, ASupervisorThatCannotCloseIsNotMadeToEndSessions) {
+    start("one");
+    Client client(port_);
+    ASSERT_TRUE(client.isServed());
+    auto listener = ControlListener::open(statePath("/run/velt"), "ftpd");
+    ASSERT_TRUE(listener);
+    const ProcessId supervisor = daemonState(ftpDaemon).supervisor;
+    std::thread former([&] {
+        listener->serve([](const ControlRequest&) { return Result<SessionCount>(Error(unknownRequest)); });
+    });
+    EXPECT_EQ(messageOf(ftp_.close()), "The FTP daemon cannot be closed: its supervisor is of a former "
+                                       "version, which can only end the sessions.");
+    former.join();
+    EXPECT_TRUE(client.isServed());
+    signalProcess(supervisor, SIGTERM); // nobody can reach its socket any more
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(supervisor); }, patience));
+}
+
 TEST_F(HandOverTest, NewConnectionsGoToTheSuccessorAlone) {
     start("one");
     const ProcessId former = daemonState(ftpDaemon).daemon;
