@@ -106,21 +106,24 @@ bool runsAsWanted(const Daemon& daemon) {
 }
 
 /// What a start does, seen from outside.
-std::optional<ChangeStep> startKind(const Daemon& daemon, bool serves) {
+std::optional<ChangeStep> startKind(const Daemon& daemon, bool serves, bool renew) {
     const std::string name(daemon.apiName);
     if (!serves) {
         return ChangeStep{StepKind::start, name};
     }
-    return runsAsWanted(daemon) ? std::nullopt : std::optional(ChangeStep{StepKind::handOver, name});
+    return !renew && runsAsWanted(daemon) ? std::nullopt
+                                          : std::optional(ChangeStep{StepKind::handOver, name});
 }
 
 /// A start, in which the daemon's sessions end if the policy, or what the change takes from them, wants it.
-void addStart(const Daemon& daemon, bool serves, const StagedRequest& request,
+void addStart(const Wish& wish, bool serves, const StagedRequest& request,
               std::vector<ProgramStep>& program) {
+    const Daemon& daemon = *wish.daemon;
     const bool ends = endsSessions(daemon, request);
-    ProgramStep step = stepOf(StepKind::start, daemon, Effect::start,
-                              ends ? SessionPolicy::end : request.policy, startDaemon);
-    step.step = startKind(daemon, serves);
+    ProgramStep step =
+        stepOf(StepKind::start, daemon, Effect::start, ends ? SessionPolicy::end : request.policy,
+               wish.renew ? renewDaemon : startDaemon);
+    step.step = startKind(daemon, serves, wish.renew);
     program.push_back(std::move(step));
     if (ends) {
         addEndOfSessions(daemon, program);
@@ -165,7 +168,7 @@ void addDaemonSteps(const StagedRequest& request, std::vector<ProgramStep>& prog
         }
         const bool serves = isServing(daemonState(*next->daemon)) && !paused.contains(next->daemon);
         if (next->start) {
-            addStart(*next->daemon, serves, request, program);
+            addStart(*next, serves, request, program);
         } else {
             addStop(*next->daemon, request, program);
         }

@@ -38,9 +38,11 @@ EffectDecision DaemonRequests::leave(Effect effect, std::string_view subject) co
 EffectDecision DaemonRequests::decide(Effect effect, std::string_view subject) {
     switch (effect) {
     case Effect::start:
-        return wish(subject, true);
+        return wish(subject, true, false);
+    case Effect::restart:
+        return wish(subject, true, true);
     case Effect::stop:
-        return wish(subject, false);
+        return wish(subject, false, false);
     case Effect::firewall:
         firewall_ = true;
         return Result<>();
@@ -57,18 +59,19 @@ EffectDecision DaemonRequests::decide(Effect effect, std::string_view subject) {
     }
 }
 
-Result<> DaemonRequests::wish(std::string_view service, bool start) {
+Result<> DaemonRequests::wish(std::string_view service, bool start, bool renew) {
     const Daemon* const daemon = daemonServing(service);
     auto known = std::ranges::find(wishes_, daemon, &Wish::daemon);
     // One daemon may serve under several names, and is asked for under each.
     if (known != wishes_.end() && known->start == start) {
+        known->renew = known->renew || renew;
         return {};
     }
     VELT_RETURN_IF_ERROR(checkWish(*daemon, start));
     if (known == wishes_.end()) {
-        wishes_.push_back({daemon, start});
+        wishes_.push_back({daemon, start, renew});
     } else {
-        known->start = start;
+        *known = {daemon, start, renew};
     }
     return {};
 }

@@ -19,6 +19,7 @@ public:
     struct Wish {
         const Daemon* daemon;
         bool start; ///< the last that was asked for: a start, or a stop
+        bool renew; ///< a start that is to exchange a daemon which runs as it should
     };
 
     DaemonRequests();
@@ -38,7 +39,7 @@ public:
 private:
     EffectDecision decide(Effect effect, std::string_view subject);
     EffectDecision leave(Effect effect, std::string_view subject) const;
-    Result<> wish(std::string_view service, bool start);
+    Result<> wish(std::string_view service, bool start, bool renew);
 
     EffectHook outer_;
     std::vector<Wish> wishes_;

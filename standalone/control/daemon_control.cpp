@@ -117,11 +117,12 @@ Result<SessionCount> start(const Daemon& daemon, const DaemonOrder& order, bool 
     return ended;
 }
 
-Result<> startPlanned(const Daemon& daemon) {
-    VELT_ASSIGN_OR_RETURN(const auto plan, daemon.plan());
+Result<> startPlanned(const Daemon& daemon, bool renew = false) {
+    VELT_ASSIGN_OR_RETURN(auto plan, daemon.plan());
     if (!plan) {
         return counted(daemon, SupervisedDaemon(daemon).stop());
     }
+    plan->order.renew = renew;
     const std::string former = daemonState(daemon).configurationHash;
     auto started = counted(daemon, start(daemon, plan->order, endsSessions(daemon, *plan, former)));
     if (started) {
@@ -156,6 +157,12 @@ Result<> startDaemon(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
     pendingStops().waiting.erase(&daemon);
     return followedByFirewall(noteOutcome(daemon, startPlanned(daemon)));
+}
+
+Result<> renewDaemon(const Daemon& daemon) {
+    VELT_ASSIGN_OR_RETURN(const auto lock, lockOperation(daemon));
+    pendingStops().waiting.erase(&daemon);
+    return followedByFirewall(noteOutcome(daemon, startPlanned(daemon, true)));
 }
 
 Result<> stopDaemon(const Daemon& daemon) {

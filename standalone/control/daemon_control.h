@@ -14,6 +14,9 @@ namespace velt {
 /// start, and a stop that no start follows, end with followWithFirewall.
 Result<> startDaemon(const Daemon& daemon);
 
+/// The same, and one that runs with the stored settings already gives way to a new one, too: it may be stuck.
+Result<> renewDaemon(const Daemon& daemon);
+
 /// Ends the daemon and its sessions. Within a request (service_request.h), this, the next and a pause wait
 /// for its end or a start, while the daemon serves and is on by the stored settings.
 Result<> stopDaemon(const Daemon& daemon);

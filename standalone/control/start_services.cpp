@@ -47,9 +47,10 @@ Result<> forEachDaemon(Result<> (*act)(const Daemon&), std::string_view service 
     return outcome;
 }
 
-Result<> startIfOn(const Daemon& daemon) {
+Result<> renewIfOn(const Daemon& daemon) {
     VELT_ASSIGN_OR_RETURN(const auto settings, daemon.settings());
-    return settings.enabled() ? followSettings(daemon) : Result<>();
+    return settings.enabled() ? perform(Effect::restart, daemon.name, [&] { return renewDaemon(daemon); })
+                              : Result<>();
 }
 
 std::vector<DaemonFailure> followAll() {
@@ -86,7 +87,7 @@ Result<> stopServices() {
 
 Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service) {
     ServiceRequest request(policy);
-    const auto done = forEachDaemon(startIfOn, service);
+    const auto done = forEachDaemon(renewIfOn, service);
     auto sessions = request.finish();
     return done ? std::move(sessions) : done.error();
 }

@@ -74,7 +74,8 @@ Result<SessionCount> SupervisedDaemon::start(const DaemonOrder& order, bool endS
     VELT_ASSIGN_OR_RETURN(const auto folder, runFolder());
     VELT_ASSIGN_OR_RETURN(const DaemonState now, knownState("does not start"));
     const bool supervised = isAlive(now.supervisor);
-    const bool unchanged = supervised && isServing(now) && now.configurationHash == order.configurationHash;
+    const bool unchanged =
+        supervised && isServing(now) && !order.renew && now.configurationHash == order.configurationHash;
     if (unchanged && !endSessions) {
         return SessionCount{};
     }

@@ -16,8 +16,8 @@ EffectHook& threadHook() {
 
 std::string_view effectName(Effect effect) {
     // In the order of Effect.
-    constexpr std::array<std::string_view, 7> names{"store",   "firewall", "stop", "start",
-                                                    "run key", "event",    "log"};
+    constexpr std::array<std::string_view, 8> names{"store",   "firewall", "stop",  "start",
+                                                    "restart", "run key",  "event", "log"};
     return names.at(static_cast<std::size_t>(effect));
 }
 

@@ -16,12 +16,13 @@ enum class Effect {
     firewall,
     stop,
     start,
+    restart, ///< also of what runs as it should
     runKey,
     event,
     logEntry,
 };
 
-/// The effect's name, for tests: "store", "firewall", "stop", "start", "run key", "event", "log".
+/// The effect's name, for tests: "store", "firewall", "stop", "start", "restart", "run key", "event", "log".
 std::string_view effectName(Effect effect);
 
 /// Does the effect by calling `act` and returns its outcome. `subject` says what it concerns ("ftp settings",

@@ -27,6 +27,7 @@ constexpr std::string_view success = "ok ";
 /// How a start deals with sessions, and how its ports are had.
 constexpr std::string_view endSessions = "end sessions";
 constexpr std::string_view keepSessions = "keep sessions";
+constexpr std::string_view renewing = "renew, "; ///< before the former
 constexpr std::string_view sharedPorts = "shared ports";
 constexpr std::string_view ownPorts = "own ports";
 /// In the order of Command.
@@ -130,7 +131,8 @@ std::string encodeRequest(const ControlRequest& request) {
     add(commandNames.at(static_cast<std::size_t>(request.command)));
     if (request.command == Command::start) {
         add(request.order.configurationHash);
-        add(request.endSessions ? endSessions : keepSessions);
+        add(std::string(request.order.renew ? renewing : "")
+                .append(request.endSessions ? endSessions : keepSessions));
         add(request.order.sharesPorts ? sharedPorts : ownPorts);
         add(std::to_string(request.order.ports.size()));
         for (const int port : request.order.ports) {
@@ -164,7 +166,8 @@ Result<ControlRequest> decodeRequest(const std::string& message) {
     }
     const std::size_t firstArgument = firstPort + static_cast<std::size_t>(portCount);
     request.order.configurationHash = fields[1];
-    request.endSessions = fields[2] == endSessions;
+    request.order.renew = fields[2].starts_with(renewing);
+    request.endSessions = fields[2].ends_with(endSessions);
     request.order.sharesPorts = fields[3] == sharedPorts;
     for (std::size_t index = firstPort; index < firstArgument; ++index) {
         request.order.ports.push_back(number(index));

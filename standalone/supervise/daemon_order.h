@@ -23,6 +23,7 @@ struct DaemonOrder {
     /// Its ports can be had by another one at the same time that says so, too: it then succeeds the former
     /// one without a moment in which nobody listens.
     bool sharesPorts = false;
+    bool renew = false; ///< a running daemon gives way to a new one although the hashes are equal
 };
 
 /// Stands before the ports of such an order on the supervisor's command line.

@@ -157,8 +157,8 @@ Result<SessionCount> Supervisor::handle(const ControlRequest& request) {
 
 Result<SessionCount> Supervisor::follow(const DaemonOrder& order, bool endSessions) {
     const auto deadline = Clock::now() + startLimit;
-    const bool unchanged =
-        state_ == RunState::running && daemon_->id() && order.configurationHash == order_.configurationHash;
+    const bool unchanged = state_ == RunState::running && daemon_->id() && !order.renew &&
+                           order.configurationHash == order_.configurationHash;
     if (!unchanged) {
         finishRetirement();
         VELT_RETURN_IF_ERROR(canHandOver(order) ? handOver(order, deadline) : exchange(order, deadline));

@@ -29,10 +29,10 @@ protected:
         }
     }
 
-    static void killDaemon(const std::string& name) {
+    static void signalDaemon(const std::string& name, const std::string& signal) {
         const std::string state = contentsOf(worldRoot / ("run/velt/" + name + ".state"));
         const std::string pid = state.substr(state.find("\ndaemon ") + 8);
-        ASSERT_EQ(runProcess({"kill", "-KILL", pid.substr(0, pid.find(' '))}).exitCode, 0) << state;
+        ASSERT_EQ(runProcess({"kill", signal, pid.substr(0, pid.find(' '))}).exitCode, 0) << state;
     }
 };
 
@@ -72,6 +72,21 @@ TEST_F(HostHealth, AKeyThatIsOpenToOthersIsFound) {
     const std::string found = diagnosis();
     EXPECT_EQ(found, "certificate-unusable: chmod 640 " + key + " && veltctl restart ftp\n");
     mend(found, "certificate-unusable");
+    EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, ADaemonThatIsStuckIsExchanged) {
+    done({"ftp", "set", "enable_ftp=on"});
+    done({"sftp", "set", "enable=on"});
+    furnishSftp();
+    for (const char* each : {"ftpd", "sftp"}) {
+        signalDaemon(each, "-STOP");
+    }
+    const std::string found = diagnosis();
+    EXPECT_EQ(found, "no-greeting: veltctl restart ftp\nno-greeting: veltctl restart sftp\n");
+    mend(found, "no-greeting");
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_TRUE(servesSftp(2222));
     EXPECT_EQ(diagnosis(), "");
 }
 
@@ -230,7 +245,7 @@ TEST_F(HostHealth, ADaemonThatWasKilledIsInTheLogAndInTheEvents) {
     done({"ftp", "set", "enable_ftp=on"});
     done({"sftp", "set", "enable=on"});
     for (const char* each : {"ftpd", "sftp"}) {
-        killDaemon(each);
+        signalDaemon(each, "-KILL");
         EXPECT_TRUE(waitUntil(
             [] {
                 return contains(veltctl({"log", "--limit", "1"}).output, "service runs again.");

@@ -228,16 +228,19 @@ TEST_F(ServiceRequestTest, APauseThatNothingFollowsIsAPause) {
     EXPECT_EQ(serviceState("sftp").state, RunState::paused);
 }
 
-TEST_F(ServiceRequestTest, ARestartReplacesWhatIsStartedOtherwiseNow) {
+TEST_F(ServiceRequestTest, ARestartReplacesDaemonsWhateverTheyRunWith) {
     storeSftp(true);
     ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
     Client ftp(ftpPort_);
     Client sftp(sftpPort_);
     ASSERT_TRUE(ftp.isServed() && sftp.isServed());
-    const ProcessId ftpDaemonBefore = daemonOf("ftpd");
-    const ProcessId sftpDaemonBefore = daemonOf("sftp");
-    EXPECT_EQ(restart(), Sessions());
-    EXPECT_EQ(daemonOf("ftpd"), ftpDaemonBefore);
+    ProcessId ftpDaemonBefore = daemonOf("ftpd");
+    ProcessId sftpDaemonBefore = daemonOf("sftp");
+    EXPECT_EQ(restart(), (Sessions{{"ftp", 0, 1}, {"sftp", 0, 1}})) << "they may be stuck";
+    EXPECT_NE(daemonOf("ftpd"), ftpDaemonBefore);
+    EXPECT_NE(daemonOf("sftp"), sftpDaemonBefore);
+    ftpDaemonBefore = daemonOf("ftpd");
+    sftpDaemonBefore = daemonOf("sftp");
     planDouble().ftpOptions = {"--share", "--delay", "1"};
     planDouble().sftpOptions = {"--delay", "1"};
     planDouble().takesRights = true;

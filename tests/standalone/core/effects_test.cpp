@@ -51,13 +51,14 @@ TEST_F(Effects, CanBeListedInsteadOfDone) {
         return Result<>();
     };
 
-    for (const Effect effect : {Effect::store, Effect::firewall, Effect::stop, Effect::start, Effect::runKey,
-                                Effect::event, Effect::logEntry})
+    for (const Effect effect : {Effect::store, Effect::firewall, Effect::stop, Effect::start, Effect::restart,
+                                Effect::runKey, Effect::event, Effect::logEntry})
         EXPECT_TRUE(perform(effect, "ftpd", act));
 
     EXPECT_FALSE(done);
-    EXPECT_EQ(listed, (std::vector<std::string>{"store: ftpd", "firewall: ftpd", "stop: ftpd", "start: ftpd",
-                                                "run key: ftpd", "event: ftpd", "log: ftpd"}));
+    EXPECT_EQ(listed,
+              (std::vector<std::string>{"store: ftpd", "firewall: ftpd", "stop: ftpd", "start: ftpd",
+                                        "restart: ftpd", "run key: ftpd", "event: ftpd", "log: ftpd"}));
 }
 
 TEST_F(Effects, AreDoneWhenTheHookSaysSo) {

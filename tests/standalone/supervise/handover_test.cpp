@@ -72,6 +72,24 @@ TEST_F(HandOverTest, SessionsGoOnWithTheirFormerDaemonGone) {
     EXPECT_TRUE(Client(port_).isServed());
 }
 
+TEST_F(HandOverTest, ADaemonThatIsStuckIsRenewedThoughNothingChanged) {
+    start("one");
+    const ProcessId former = daemonState(ftpDaemon).daemon;
+    Client client(port_);
+    ASSERT_TRUE(client.isServed());
+    EXPECT_EQ(start("one"), SessionCount());
+    EXPECT_EQ(daemonState(ftpDaemon).daemon, former);
+    signalProcess(former, SIGSTOP);
+    DaemonOrder order = testOrder(port_, "one", {"--share"});
+    order.renew = true;
+    EXPECT_EQ(ftp_.start(order, false).valueOr({}), (SessionCount{0, 1}));
+    EXPECT_NE(daemonState(ftpDaemon).daemon, former);
+    EXPECT_TRUE(Client(port_).isServed());
+    EXPECT_TRUE(client.isServed());
+    EXPECT_TRUE(waitUntil([&] { return !isAlive(former); }, patience));
+    EXPECT_EQ(start("one"), SessionCount()) << "the next order is none to renew";
+}
+
 TEST_F(HandOverTest, AFormerDaemonThatStaysForAMomentIsNoSession) {
     start("one");
     const ProcessId former = daemonState(ftpDaemon).daemon;
