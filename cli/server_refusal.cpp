@@ -67,7 +67,7 @@ std::string historyHint(const Json::Value& problem, const std::string& path) {
 }
 
 std::string conflictHint(const Json::Value& problem, const std::string& path) {
-    if (const std::string hint = historyHint(problem, path); !hint.empty()) {
+    if (std::string hint = historyHint(problem, path); !hint.empty()) {
         return hint;
     }
     if (problem["code"] == codeShareUnreachable) {

@@ -15,7 +15,7 @@ bool isInTheWay(const Daemon& daemon, const Daemon& other);
 
 /// One that could not be brought there.
 struct DaemonFailure {
-    const Daemon* daemon;
+    const Daemon* daemon = nullptr;
     Error error;
 };
 
