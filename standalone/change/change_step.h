@@ -31,7 +31,8 @@ struct ChangeStep {
 
 using ChangeSteps = std::vector<ChangeStep>;
 
-/// "store", "start", "hand over", "pause", "stop", "close", "end sessions", "open port", "close port", "event", "log".
+/// "store", "start", "hand over", "pause", "stop", "close", "end sessions", "open port", "close port",
+/// "event", "log".
 std::string_view stepName(StepKind kind);
 
 } // namespace velt

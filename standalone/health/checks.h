@@ -22,7 +22,8 @@ inline constexpr std::string_view settingsNotInForce = "settings-not-in-force";
 /// A change that failed and could not be taken back, or not wholly.
 Findings changeFindings();
 
-/// An administrator log that cannot be used; changes that nobody confirmed and that are in force nevertheless.
+/// An administrator log that cannot be used; changes that nobody confirmed and that are in force
+/// nevertheless.
 Findings journalFindings(TimePoint now);
 
 /// Services that run, and do not greet or take up TLS as their clients expect, or serve a certificate other

@@ -26,7 +26,8 @@ protected:
     static SystemMoment settled();
 
     /// The dry run does nothing, and the change does what it said, no more and no less, as far as that can be
-    /// seen from outside; the same for the sessions that it ends, of some that are open. `what` is for the message of a failure.
+    /// seen from outside; the same for the sessions that it ends, of some that are open. `what` is for the
+    /// message of a failure.
     void expectAsPlanned(const std::string& what, const Ask& ask);
     /// The same for a patch of the document.
     void expectAsPlanned(const std::string& patchBody);
