@@ -41,6 +41,15 @@ HttpResponse refused(const std::vector<FieldError>& errors, const std::string& r
     return problemWith(422, std::move(members), requestId);
 }
 
+FieldError faultOfIgnored(const Json::Value& rule, const std::string& place) {
+    const std::string type = rule["type"].asString();
+    const std::string name = rule["name"].asString();
+    if (!isRuleOwner(type == "user", name)) {
+        return {place + "/name", "a " + type + " that exists, not " + name};
+    }
+    return {place + "/path", "a folder like /home or /SHARE/FOLDER, not " + rule["path"].asString()};
+}
+
 /// What was accepted and not taken: a rule for somebody who does not exist, a value that another setting
 /// overrules.
 std::vector<FieldError> ignoredParts(const Json::Value& wanted, const Json::Value& after) {
@@ -55,11 +64,7 @@ std::vector<FieldError> ignoredParts(const Json::Value& wanted, const Json::Valu
     for (Json::ArrayIndex i = 0; i < wanted[rules].size(); ++i) {
         const auto isRule = [&](const Json::Value& each) { return each == wanted[rules][i]; };
         if (std::none_of(after[rules].begin(), after[rules].end(), isRule)) {
-            const Json::Value& rule = wanted[rules][i];
-            errors.push_back({"/" + rules + "/" + std::to_string(i),
-                              "a user or group that exists, and a folder like /home or /SHARE/FOLDER; not " +
-                                  rule["type"].asString() + " " + rule["name"].asString() + " with " +
-                                  rule["path"].asString()});
+            errors.push_back(faultOfIgnored(wanted[rules][i], "/" + rules + "/" + std::to_string(i)));
         }
     }
     return errors;

@@ -1,5 +1,6 @@
 #include "standalone/rules/unnamed_rules.h"
 
+#include "standalone/accounts/user_directory.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/rules/rule_store.h"
 
@@ -31,6 +32,10 @@ Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules) {
         stored.insert(stored.begin() + place, each.rule);
     }
     return storeRules(stored);
+}
+
+bool isRuleOwner(bool isUser, const std::string& name) {
+    return isUser ? userByName(name).has_value() : groupByName(name).has_value();
 }
 
 } // namespace velt

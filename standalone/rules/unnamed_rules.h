@@ -6,6 +6,7 @@
 #include "standalone/rules/chroot_rule.h"
 
 #include <cstddef>
+#include <string>
 #include <vector>
 
 namespace velt {
@@ -28,6 +29,9 @@ Result<RulesByName> countRulesByName();
 /// Puts each rule at its place among the stored ones, the first places first; at the end, where there are
 /// fewer. To be called in the change that stored the others. Thread-safe.
 Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules);
+
+/// Whether a user (or a group, with isUser false) of this name is known. Thread-safe.
+bool isRuleOwner(bool isUser, const std::string& name);
 
 } // namespace velt
 

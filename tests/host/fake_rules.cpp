@@ -54,4 +54,9 @@ Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules) {
     return {};
 }
 
+bool isRuleOwner(bool isUser, const std::string& name) {
+    const auto& platform = fake::Platform::instance();
+    return isUser ? platform.users.contains(name) : platform.groups.contains(name);
+}
+
 } // namespace velt

@@ -145,7 +145,9 @@ TEST_F(HostRefusal, aRefusedValueIsExplained) {
                   "enable_ftp: expected true or false");
     expectFailure({"call", "VELT.Core.FileServ.FTP", "4", "set"}, 3, "There is nothing");
     expectFailure({"chroot", "rules", "add", "user", "nobody-like-this", "/home"}, 3,
-                  "/chroot_rules/0: expected a user or group that exists");
+                  "/chroot_rules/0/name: expected a user that exists, not nobody-like-this");
+    expectFailure({"chroot", "rules", "add", "user", "alice", "/a/../b"}, 3,
+                  "/chroot_rules/0/path: expected a folder like /home or /SHARE/FOLDER, not /a/../b");
     expectFailure({"chroot", "rules", "remove", "user", "alice"}, 3, "no rule for the user alice");
     expectFailure({"tokens", "delete", "absent"}, 3, "absent");
 }

@@ -178,8 +178,8 @@ TEST_F(HostSettings, WhatIsStoredAlreadyIsNotJudged) {
 TEST_F(HostSettings, ARuleForSomebodyUnknownIsNamed) {
     const Answer answer = patch(R"({"chroot_rules":[{"type":"user","name":"nobody-knows","path":"/home"}]})");
     EXPECT_EQ(answer.status, 422) << answer.body;
-    EXPECT_EQ(fieldsOf(answer), Fields{"/chroot_rules/0"}) << answer.body;
-    EXPECT_NE(answer.body.find("not user nobody-knows with /home"), std::string::npos) << answer.body;
+    EXPECT_EQ(fieldsOf(answer), Fields{"/chroot_rules/0/name"}) << answer.body;
+    EXPECT_NE(answer.body.find("a user that exists, not nobody-knows"), std::string::npos) << answer.body;
 }
 
 TEST_F(HostSettings, AChangeOfRulesIsWrittenDownRuleByRule) {
