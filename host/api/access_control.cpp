@@ -40,8 +40,9 @@ bool isForeignPage(const HttpRequest& head, const Peer& peer) {
 
 } // namespace
 
-AccessControl::AccessControl(AccessSettings settings, const TokenStore& tokens, HostLog& log)
-    : settings_(std::move(settings)), tokens_(tokens), log_(log) {}
+AccessControl::AccessControl(AccessSettings settings, const TokenStore& tokens, WrongTokens& wrongTokens,
+                             HostLog& log)
+    : settings_(std::move(settings)), tokens_(tokens), wrongTokens_(wrongTokens), log_(log) {}
 
 std::optional<Refusal> AccessControl::check(const HttpRequest& head, const Peer& peer,
                                             Principal& principal) const {
@@ -90,7 +91,7 @@ std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, cons
     const auto token = bearer ? tokens_.find(head.authorization.substr(schemeLength)) : std::nullopt;
     if (!token) {
         if (!peer.isUnixSocket) {
-            noteFailedLogin("veltd", peer.address);
+            wrongTokens_.note(peer.address);
         }
         return refuse(401, "The token is not valid.", peer, true);
     }

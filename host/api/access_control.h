@@ -7,6 +7,7 @@
 #define VELT_HOST_API_ACCESS_CONTROL_H
 
 #include "host/api/token_store.h"
+#include "host/api/wrong_tokens.h"
 #include "host/base/host_log.h"
 #include "host/http/message.h"
 #include "standalone/standalone.h"
@@ -26,8 +27,8 @@ struct AccessSettings {
 /// Thread-safe.
 class AccessControl {
 public:
-    /// The store and the log outlive it.
-    AccessControl(AccessSettings settings, const TokenStore& tokens, HostLog& log);
+    /// All but the settings outlive it.
+    AccessControl(AccessSettings settings, const TokenStore& tokens, WrongTokens& wrongTokens, HostLog& log);
 
     /// Fills `principal` and returns nothing when access is granted.
     std::optional<Refusal> check(const HttpRequest& head, const Peer& peer, Principal& principal) const;
@@ -42,6 +43,7 @@ private:
 
     AccessSettings settings_;
     const TokenStore& tokens_;
+    WrongTokens& wrongTokens_;
     HostLog& log_;
 };
 

@@ -78,10 +78,10 @@ private:
 } // namespace
 
 App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
-    : log_(log), tokens_(settings.tokenFile), access_(settings.access, tokens_, log),
-      platformEvents_(events_), changes_(table, metrics_, events_, log),
-      rows_(table, openApi_, metrics_, changes_, log), settings_(table, openApi_, changes_),
-      history_(table, settings_, log),
+    : log_(log), tokens_(settings.tokenFile), wrongTokens_(log),
+      access_(settings.access, tokens_, wrongTokens_, log), platformEvents_(events_),
+      changes_(table, metrics_, events_, log), rows_(table, openApi_, metrics_, changes_, log),
+      settings_(table, openApi_, changes_), history_(table, settings_, log),
       order_(settings.workers, settings.maxWaiting, settings.maxWaitingBytes) {
     addRoutes(table);
     confirmations_.emplace(history_, order_);
@@ -91,6 +91,7 @@ App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
 void App::stop() {
     order_.stop(); // first: its tasks wake the other
     confirmations_.reset();
+    wrongTokens_.stop();
 }
 
 void App::addRoutes(const ModuleTable& table) {

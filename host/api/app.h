@@ -13,6 +13,7 @@
 #include "host/api/route.h"
 #include "host/api/rows.h"
 #include "host/api/token_store.h"
+#include "host/api/wrong_tokens.h"
 #include "host/base/host_log.h"
 #include "host/http/message.h"
 #include "host/module/module_table.h"
@@ -71,6 +72,7 @@ private:
 
     HostLog& log_;
     TokenStore tokens_;
+    WrongTokens wrongTokens_;
     AccessControl access_;
     OpenApi openApi_;
     Metrics metrics_;

@@ -43,6 +43,7 @@ struct FakeStandalone {
     std::vector<velt::Ban> bans;
     bool bansFail = false;                 ///< with `sentence`
     std::vector<std::string> failedLogins; ///< "SERVICE ADDRESS"
+    std::function<void()> whileNoted;      ///< called for each of them before
     std::string actor;                     ///< of the last request
     std::string address;
 
@@ -52,6 +53,9 @@ struct FakeStandalone {
 
     /// As it was at first.
     void reset();
+
+    /// The failed logins up to now.
+    std::vector<std::string> noted() const;
 
     /// Damages what is kept of a change.
     void damageChange(std::int64_t id);

@@ -1,0 +1,51 @@
+// The fake standalone's failed logins and bans.
+#include "tests/host/fake_standalone.h"
+
+#include <mutex>
+
+namespace {
+
+std::mutex mutex; ///< guards the failed logins
+
+} // namespace
+
+std::vector<std::string> FakeStandalone::noted() const {
+    const std::lock_guard lock(mutex);
+    return failedLogins;
+}
+
+namespace velt {
+
+void noteFailedLogin(const std::string& service, const std::string& address) {
+    if (FakeStandalone::instance().whileNoted) {
+        FakeStandalone::instance().whileNoted();
+    }
+    const std::lock_guard lock(mutex);
+    FakeStandalone::instance().failedLogins.push_back(service + " " + address);
+}
+
+Result<CurrentBans> currentBans() {
+    const FakeStandalone& fake = FakeStandalone::instance();
+    return fake.bansFail ? Result<CurrentBans>(Error(fake.sentence)) : CurrentBans{fake.bans, true};
+}
+
+std::optional<Ban> currentBanOf(const std::string& address) {
+    const auto network = parseIpAddress(address);
+    for (const Ban& ban : FakeStandalone::instance().bans) {
+        if (network && ban.source.contains(*network)) {
+            return ban;
+        }
+    }
+    return std::nullopt;
+}
+
+Result<bool> liftBan(const std::string& addressOrSource) {
+    FakeStandalone& fake = FakeStandalone::instance();
+    if (fake.bansFail) {
+        return Error(fake.sentence);
+    }
+    return std::erase_if(fake.bans, [&](const Ban& ban) { return toText(ban.source) == addressOrSource; }) >
+           0;
+}
+
+} // namespace velt
