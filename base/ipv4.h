@@ -17,6 +17,10 @@ std::optional<IPv4Address> parseIPv4(std::string_view text);
 
 std::string toText(const IPv4Address& address);
 
+/// What addresses are like this one, at which no other machine reaches a server: "a loopback address". Null
+/// for one that may be a server's (RFC 6890).
+const char* unreachableKindOf(const IPv4Address& address);
+
 } // namespace velt
 
 #endif

@@ -32,9 +32,10 @@ void restart(Context& context, const RestartOptions& options) {
         return;
     }
     for (const Json::Value& service : answer["services"]) {
-        context.console.out << printable(textAt(service, "service")) << ": restarted, "
-                            << service["kept"].asInt() << " sessions go on, " << service["ended"].asInt()
-                            << " ended\n";
+        const int kept = service["kept"].asInt();
+        context.console.out << printable(textAt(service, "service")) << ": restarted, " << kept
+                            << (kept == 1 ? " session goes on, " : " sessions go on, ")
+                            << service["ended"].asInt() << " ended\n";
     }
     context.console.out << "The services that are on run with what is stored now.\n";
 }

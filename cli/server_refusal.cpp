@@ -82,7 +82,7 @@ std::string failureHint(const Json::Value& problem, const AskedFor& asked) {
     if (asked.path.starts_with("/api/restart")) { // settings stay as they are
         return "Fix the problem that the server names, then try again; 'veltctl status' shows what runs.";
     }
-    const bool reads = asked.method == "GET";
+    const bool reads = asked.method == "GET" || asked.path == "/api/diff";
     const bool changed =
         problem["changed"].isBool() ? problem["changed"].asBool() : !reads && !problem.isMember("code");
     return changed ? "Part of the change may be in effect: check 'veltctl status' and 'veltctl log'. The "
@@ -150,7 +150,7 @@ void addNotes(Failure& failure, const Json::Value& problem) {
         add(fact, fact);
     }
     add(holder, "held by " + holder);
-    if (problem["changed"] == false) {
+    if (problem["changed"] == false && detail.find("as it was before") == std::string::npos) {
         add("Nothing was changed.", "Nothing was changed.");
     }
     if (const std::string id = textAt(problem, "request_id"); !id.empty()) {

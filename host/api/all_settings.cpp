@@ -125,7 +125,7 @@ HttpResponse AllSettings::change(const Call& call, bool isPatch) {
     if (!before) {
         return failedUnchanged(before.error().message, call.id);
     }
-    const Json::Value wanted = isPatch ? patched(*before, *body) : *body;
+    const Json::Value wanted = withNames(isPatch ? patched(*before, *body) : *body);
     return store(*before, wanted, "settings", std::get<ChangeOptions>(options), call);
 }
 

@@ -11,6 +11,7 @@ namespace velt::host {
 namespace {
 
 constexpr std::int64_t longestConfirmation = 86400;
+constexpr const char* onlyOne = "one value, not several";
 
 /// `take` returns false for a value other than the expected.
 struct Option {
@@ -52,7 +53,11 @@ constexpr std::array<Option, 3> known{{
 
 std::variant<ChangeOptions, FieldError> parseChangeOptions(const std::string& query) {
     ChangeOptions options;
-    for (const auto& [key, value] : queryParameters(query)) {
+    const auto parameters = queryParameters(query);
+    if (const auto repeated = repeatedKey(parameters)) {
+        return FieldError{*repeated, onlyOne};
+    }
+    for (const auto& [key, value] : parameters) {
         const auto* const option = std::ranges::find(known, key, &Option::key);
         if (option == known.end()) {
             return FieldError{key, "one of dry_run, sessions or confirm_within"};
@@ -66,7 +71,11 @@ std::variant<ChangeOptions, FieldError> parseChangeOptions(const std::string& qu
 
 std::variant<bool, FieldError> parseDryRun(const std::string& query) {
     ChangeOptions options;
-    for (const auto& [key, value] : queryParameters(query)) {
+    const auto parameters = queryParameters(query);
+    if (const auto repeated = repeatedKey(parameters)) {
+        return FieldError{*repeated, onlyOne};
+    }
+    for (const auto& [key, value] : parameters) {
         if (key != known[0].key) {
             return FieldError{key, "only dry_run"};
         }

@@ -18,6 +18,11 @@ namespace velt::host {
 
 namespace {
 
+/// Nobody has asked for what veltd does by itself.
+std::string whoAsked(const Principal& principal) {
+    return principal.actor.empty() ? "veltd itself" : principal.actor + " at " + principal.address;
+}
+
 /// A change that the platform could not do, though the module accepted it.
 HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId) {
     const bool taken = outcome.undone && outcome.failure->number == ErrorNumber::portTaken;
@@ -205,8 +210,7 @@ void Changes::tell(const ChangeRequest& request, const ChangeReport& report) {
         }
     }
     log_.write(request.call.id,
-               request.way + " for " + request.call.principal.actor + " at " +
-                   request.call.principal.address + ": " +
+               request.way + " for " + whoAsked(request.call.principal) + ": " +
                    (report.changes.empty() ? "no other settings" : summaryOf(report.changes)));
     if (!report.down.empty()) {
         log_.write(request.call.id, sentenceOf(report.down));

@@ -4,7 +4,6 @@
 #include "base/json_value.h"
 #include "base/number_text.h"
 #include "base/text.h"
-#include "host/api/rules_section.h"
 #include "host/api/settings_document.h"
 #include "host/base/json.h"
 #include "schema/setting_text.h"
@@ -125,8 +124,12 @@ void checkPassiveRange(const Json::Value& ftp, const Json::Value& current, Error
 
 void checkAddress(const Json::Value& ftp, Errors& errors) {
     const std::string address = ftp["ext_ip"].isString() ? ftp["ext_ip"].asString() : "";
-    if (!address.empty() && !parseIPv4(address)) {
+    const auto parsed = parseIPv4(address);
+    if (!address.empty() && !parsed) {
         errors.push_back({"/ftp/ext_ip", "an IPv4 address such as 192.0.2.1, or an empty text"});
+    } else if (const char* const kind = parsed ? unreachableKindOf(*parsed) : nullptr) {
+        errors.push_back(
+            {"/ftp/ext_ip", std::string("an address at which clients reach this server, not ") + kind});
     }
 }
 
@@ -213,7 +216,7 @@ std::optional<FieldError> faultOfRule(const Json::Value& rule, const std::string
     return std::nullopt;
 }
 
-void checkRules(const Json::Value& rules, const Json::Value& current, Errors& errors) {
+void checkRules(const Json::Value& rules, Errors& errors) {
     const std::string section = "/" + std::string(rulesSection);
     if (!rules.isArray()) {
         errors.push_back({section, "a list"});
@@ -228,10 +231,6 @@ void checkRules(const Json::Value& rules, const Json::Value& current, Errors& er
             const std::string type = rules[i]["type"].asString();
             errors.push_back({place + "/name", "one rule for each " + type + ", not a second one for " +
                                                    rules[i]["name"].asString()});
-        } else if (isUnnamed(rules[i]) &&
-                   std::find(current.begin(), current.end(), rules[i]) == current.end()) {
-            errors.push_back({place + "/name", "the name of a user or group; a number can only keep the "
-                                               "rule that it has"});
         }
     }
 }
@@ -284,7 +283,7 @@ std::vector<FieldError> checkSettings(const Json::Value& wanted, const Json::Val
     }
     const std::string rules(rulesSection);
     if (current.isMember(rules) && wanted[rules] != current[rules]) {
-        checkRules(wanted[rules], current[rules], errors);
+        checkRules(wanted[rules], errors);
     }
     if (errors.empty() && current.isMember(schema::ftp.name)) {
         checkFtp(wanted[schema::ftp.name], current[schema::ftp.name], errors);

@@ -6,6 +6,7 @@
 #include "host/api/audit.h"
 #include "host/api/problem.h"
 #include "host/api/recorded_change.h"
+#include "host/api/rules_section.h"
 #include "host/api/settings_document.h"
 #include "host/base/json.h"
 #include "host/base/query_text.h"
@@ -42,9 +43,21 @@ struct Undoing {
     std::vector<FieldError> conflicts;
 };
 
+/// Accounts may have come or gone since the change.
+Json::Value withNamesOfNow(Json::Value field) {
+    const std::string rules(rulesSection);
+    if (field["field"] == "/" + rules) {
+        for (const char* each : {"from", "to"}) {
+            field[each] = withNames(jsonObject({{rules.c_str(), field[each]}}))[rules];
+        }
+    }
+    return field;
+}
+
 Undoing undoing(const ChangeRecord& change, const Json::Value& current) {
     Undoing result{current, {}};
-    for (const Json::Value& each : fieldsOf(change)) {
+    for (const Json::Value& stored : fieldsOf(change)) {
+        const Json::Value each = withNamesOfNow(stored);
         Json::Value& place = placeIn(result.wanted, each["field"].asString());
         if (place == each["to"]) {
             place = each["from"];
@@ -117,6 +130,9 @@ HttpResponse list(const Call& call) {
 }
 
 HttpResponse confirm(HostLog& log, const Call& call) {
+    if (auto unread = bodyProblem(call.request.body, call.id)) {
+        return std::move(*unread);
+    }
     const auto dryRun = parseDryRun(call.request.query());
     if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
         return fieldProblem(400, *bad, " Nothing was confirmed.", call.id);
@@ -199,6 +215,9 @@ std::vector<Route> History::routes() {
 }
 
 HttpResponse History::undo(const Call& call) {
+    if (auto unread = bodyProblem(call.request.body, call.id)) {
+        return std::move(*unread);
+    }
     const auto options = parseChangeOptions(call.request.query());
     if (const auto* const bad = std::get_if<FieldError>(&options)) {
         return fieldProblem(400, *bad, " Nothing was changed.", call.id);
@@ -213,7 +232,7 @@ HttpResponse History::undo(const Call& call) {
     }
     const auto current = readSettingsDocument(table_, call.principal);
     if (!current) {
-        return problem(500, current.error().message, call.id);
+        return failedUnchanged(current.error().message, call.id);
     }
     const auto [wanted, conflicts] = undoing(*record, *current);
     if (!conflicts.empty()) {

@@ -43,6 +43,16 @@ HttpResponse fieldProblem(int status, const FieldError& error, const std::string
     return problemWith(status, std::move(members), requestId);
 }
 
+std::optional<HttpResponse> bodyProblem(const std::string& body, const std::string& requestId) {
+    if (body.empty() || body == "{}" || body == "{}\n") {
+        return std::nullopt;
+    }
+    return problem(400,
+                   "Expected no body: the options of this request are parameters of the query, such as "
+                   "?dry_run=true. Nothing was changed.",
+                   requestId);
+}
+
 Json::Value toObject(const FieldError& error) {
     return jsonObject({{"field", error.field}, {"expected", error.expected}});
 }

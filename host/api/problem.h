@@ -33,6 +33,10 @@ HttpResponse notAnObject(const Error& reason, const std::string& extent, const s
 HttpResponse fieldProblem(int status, const FieldError& error, const std::string& extent,
                           const std::string& requestId);
 
+/// The problem of a request that has a body although its method takes parameters of the query only: what the
+/// body asks for would not be done. Nothing without a body, or for an empty object.
+std::optional<HttpResponse> bodyProblem(const std::string& body, const std::string& requestId);
+
 /// {"field", "expected"}
 Json::Value toObject(const FieldError& error);
 

@@ -37,7 +37,11 @@ const char* expectedFor(const std::string& key) {
 /// Reads "service=ftp&sessions=end&dry_run=true".
 std::variant<Wish, FieldError> wishIn(const std::string& query) {
     Wish wish;
-    for (const auto& [key, value] : queryParameters(query)) {
+    const auto parameters = queryParameters(query);
+    if (const auto repeated = repeatedKey(parameters)) {
+        return FieldError{*repeated, "one value, not several"};
+    }
+    for (const auto& [key, value] : parameters) {
         if (key == "service" && value && isService(*value)) {
             wish.service = *value;
         } else if (key == "sessions" && (value == "keep" || value == "end")) {
@@ -91,6 +95,9 @@ HttpResponse restartPlan(const Wish& wish, const Call& call) {
 }
 
 HttpResponse restart(HostLog& log, const Call& call) {
+    if (auto unread = bodyProblem(call.request.body, call.id)) {
+        return std::move(*unread);
+    }
     const auto wish = wishIn(call.request.query());
     if (const auto* const bad = std::get_if<FieldError>(&wish)) {
         return fieldProblem(400, *bad, "", call.id);

@@ -2,6 +2,7 @@
 
 #include "base/json_value.h"
 #include "base/number_text.h"
+#include "host/api/settings_document.h"
 #include "standalone/standalone.h"
 
 #include <limits>
@@ -39,6 +40,18 @@ Result<std::optional<Json::Value>> allRules(const Json::Value& named) {
         rules.insert(static_cast<Json::ArrayIndex>(each.place), toObject(each.rule));
     }
     return std::optional(rules);
+}
+
+Json::Value withNames(Json::Value document) {
+    Json::Value& rules = document[std::string(rulesSection)];
+    for (Json::ArrayIndex i = 0; rules.isArray() && i < rules.size(); ++i) {
+        if (isUnnamed(rules[i])) {
+            const auto number = numberIn(rules[i]["name"].asString());
+            const auto name = ruleOwnerName(rules[i]["type"] == "user", *number);
+            rules[i]["name"] = name ? Json::Value(*name) : rules[i]["name"];
+        }
+    }
+    return document;
 }
 
 Json::Value namedRules(const Json::Value& rules) {

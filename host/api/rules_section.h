@@ -18,6 +18,9 @@ Result<std::optional<Json::Value>> allRules(const Json::Value& named);
 /// Whether the rule is for an account without a name.
 bool isUnnamed(const Json::Value& rule);
 
+/// The document, in which rules of accounts that have a name again have that name, as stored ones do.
+Json::Value withNames(Json::Value document);
+
 /// The others, for the module.
 Json::Value namedRules(const Json::Value& rules);
 

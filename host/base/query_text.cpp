@@ -3,6 +3,7 @@
 #include "host/base/percent_encoding.h"
 
 #include <algorithm>
+#include <set>
 #include <sstream>
 
 namespace velt::host {
@@ -26,6 +27,16 @@ std::vector<QueryParameter> queryParameters(const std::string& query) {
             {part.substr(0, equals), decoded(equals == std::string::npos ? "" : part.substr(equals + 1))});
     }
     return parameters;
+}
+
+std::optional<std::string> repeatedKey(const std::vector<QueryParameter>& parameters) {
+    std::set<std::string> seen;
+    for (const QueryParameter& each : parameters) {
+        if (!seen.insert(each.key).second) {
+            return each.key;
+        }
+    }
+    return std::nullopt;
 }
 
 } // namespace velt::host

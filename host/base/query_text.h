@@ -16,6 +16,9 @@ struct QueryParameter {
 /// Reads "since=2026-11-21&limit=3", in its order. A parameter without "=" has the value "".
 std::vector<QueryParameter> queryParameters(const std::string& query);
 
+/// A key that comes more than once, so that nobody can tell which value counts; nothing when there is none.
+std::optional<std::string> repeatedKey(const std::vector<QueryParameter>& parameters);
+
 } // namespace velt::host
 
 #endif

@@ -17,7 +17,7 @@ constexpr std::size_t longestPath = 1024;
 bool isRenderable(const std::filesystem::path& path) {
     const std::string text = path.string();
     return path.is_absolute() && text.size() <= longestPath && std::ranges::none_of(text, isControl) &&
-           text.find_first_of("\"\\%*") == std::string::npos;
+           text.find_first_of("\"\\%*=") == std::string::npos;
 }
 
 bool isPlainName(const std::string& name) {
@@ -32,7 +32,7 @@ Result<> checkRenderable(const std::filesystem::path& path, const std::filesyste
     const bool tooLong = path.native().size() > longestPath;
     return Error(ErrorNumber::invalid,
                  "Cannot use the folder " + folder.string() + ": its path " +
-                     (tooLong ? "is too long." : "may not contain \" \\ % * or control characters."));
+                     (tooLong ? "is too long." : "may not contain \" \\ % * = or control characters."));
 }
 
 Result<> runConfigurationTest(const std::string& label, const std::vector<std::string>& arguments) {

@@ -11,7 +11,7 @@
 namespace velt {
 
 /// Whether the path can stand between quotes in a configuration: absolute, of at most 1024 bytes, and without
-/// the characters that mean something to a daemon even there.
+/// the characters that mean something to a daemon even there, or to env(1) in front of a program.
 bool isRenderable(const std::filesystem::path& path);
 
 /// Whether the account's name is of letters, digits, '.', '_' and '-', which mean nothing to any daemon.

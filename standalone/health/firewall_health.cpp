@@ -35,11 +35,26 @@ bool sameRanges(const std::vector<VELT_FTP_PORT_RANGE>& some,
     });
 }
 
+/// The rules that are loaded; nothing when there are none, or they cannot be listed.
+std::optional<TableInForce> listedTable() {
+    const auto listed = runProcess({"nft", "--json", "list", "table", "inet", "velt_fileserv"}, {}, nftLimit);
+    return listed && listed->exitCode == 0 ? readTable(listed->output) : std::nullopt;
+}
+
+/// What cannot be read asks for no rules; those from before are in force as long as nobody removes them.
+Finding damagedSettings(const Error& error) {
+    const bool kept = listedTable().has_value();
+    return finding("firewall-settings-damaged", Severity::error,
+                   error.message + (kept ? " The firewall keeps its former rules."
+                                         : " No rules of this system are in force: all ports of this server "
+                                           "are open that others do not close."),
+                   "Correct the file, then run: " + std::string(reload));
+}
+
 /// Whether the table does what the settings and the services need.
 Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& needs) {
     const bool drops = settings.mode == FirewallMode::drop;
-    const auto listed = runProcess({"nft", "--json", "list", "table", "inet", "velt_fileserv"}, {}, nftLimit);
-    const auto table = listed && listed->exitCode == 0 ? readTable(listed->output) : std::nullopt;
+    const auto table = listedTable();
     if (!table) {
         return {finding("firewall-rules-missing", drops ? Severity::error : Severity::warning,
                         std::string("The firewall rules of this system are not in force: ") +
@@ -127,9 +142,7 @@ Findings firewallFindings() {
     }
     const auto settings = loadFirewallSettings();
     if (!settings) {
-        return {finding("firewall-settings-damaged", Severity::error,
-                        settings.error().message + " The firewall keeps its former rules.",
-                        "Correct the file, then run: " + std::string(reload))};
+        return {damagedSettings(settings.error())};
     }
     const auto generation = rulesetGeneration();
     const auto needs = firewallNeeds();

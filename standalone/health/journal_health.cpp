@@ -8,7 +8,7 @@ namespace velt {
 namespace {
 
 /// A change that is due is taken back at once, which may take some seconds.
-constexpr std::chrono::seconds grace{15};
+constexpr std::chrono::seconds grace{5};
 constexpr int mostWaiting = 1000;
 
 Finding unusableLog(const Error& error) {

@@ -17,7 +17,7 @@ namespace {
 /// Beside so many ports, those that the kernel takes for outgoing connections do not matter.
 constexpr int roomyRange = 16;
 
-constexpr const char* moveRange = "veltctl ftp set custom_port_range=on custom_port=FIRST-LAST";
+constexpr const char* moveRange = "veltctl ftp set custom_port_range=on custom_port=FIRST:LAST";
 
 bool contains(const VELT_FTP_PORT_RANGE& range, int port) {
     return port >= range.first && port <= range.last;

@@ -54,9 +54,9 @@ Result<std::vector<ChrootRule>> loadRules() {
     }
     VELT_ASSIGN_OR_RETURN(const bool expected, areRulesExpected());
     if (expected) {
-        return Error(ErrorNumber::damaged,
-                     "The file of the chroot rules, " + rulesFile().string() +
-                         ", is missing. Put your copy back, or run: " + makeRulesCommand());
+        return Error(ErrorNumber::damaged, "The file of the chroot rules, " + rulesFile().string() +
+                                               ", is missing. Put your copy back; 'veltctl doctor' has the "
+                                               "command for going on without rules.");
     }
     return std::vector<ChrootRule>();
 }

@@ -34,6 +34,11 @@ Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules) {
     return storeRules(stored);
 }
 
+std::optional<std::string> ruleOwnerName(bool isUser, unsigned id) {
+    auto name = ownerOf({isUser, id, ""});
+    return name ? std::optional(std::move(*name)) : std::nullopt;
+}
+
 bool isRuleOwner(bool isUser, const std::string& name) {
     return isUser ? userByName(name).has_value() : groupByName(name).has_value();
 }

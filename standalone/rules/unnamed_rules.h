@@ -6,6 +6,7 @@
 #include "standalone/rules/chroot_rule.h"
 
 #include <cstddef>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -29,6 +30,10 @@ Result<RulesByName> countRulesByName();
 /// Puts each rule at its place among the stored ones, the first places first; at the end, where there are
 /// fewer. To be called in the change that stored the others. Thread-safe.
 Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules);
+
+/// The name of the user (or, with isUser false, of the group) with this number; nothing when there is none.
+/// Thread-safe.
+std::optional<std::string> ruleOwnerName(bool isUser, unsigned id);
 
 /// Whether a user (or a group, with isUser false) of this name is known. Thread-safe.
 bool isRuleOwner(bool isUser, const std::string& name);

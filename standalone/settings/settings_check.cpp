@@ -85,21 +85,6 @@ Result<> checkPassiveRange(const _tag_VELT_FTP_CONF_& record) {
     return {};
 }
 
-/// What addresses like this one are; null for one that may be a server's.
-const char* unreachableKindOf(const IPv4Address& address) {
-    constexpr int firstMulticast = 224;
-    constexpr int firstReserved = 240;
-    if (address[0] == 0)
-        return "one of no host";
-    if (address[0] == 127)
-        return "a loopback address";
-    if (address[0] == 169 && address[1] == 254)
-        return "a link-local address";
-    if (address[0] >= firstReserved)
-        return "a broadcast or reserved address";
-    return address[0] >= firstMulticast ? "a multicast address" : nullptr;
-}
-
 } // namespace
 
 Result<> checkFtpSettings(const FtpSettings& settings) {

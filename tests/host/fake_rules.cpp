@@ -14,17 +14,6 @@ velt::ChrootRule ruleIn(const std::string& line) {
     return {line.starts_with("user"), static_cast<unsigned>(std::stoul(number)), line.substr(second + 1)};
 }
 
-bool hasName(const velt::ChrootRule& rule) {
-    const auto& platform = fake::Platform::instance();
-    if (rule.isUser) {
-        return std::ranges::any_of(platform.users, [&](const auto& each) {
-            return static_cast<unsigned>(each.second.uid) == rule.id;
-        });
-    }
-    return std::ranges::any_of(
-        platform.groups, [&](const auto& each) { return static_cast<unsigned>(each.second) == rule.id; });
-}
-
 } // namespace
 
 namespace velt {
@@ -34,7 +23,7 @@ Result<RulesByName> countRulesByName() {
     std::size_t place = 0;
     for (const std::string& line : fake::Platform::instance().rules) {
         const ChrootRule rule = ruleIn(line);
-        if (hasName(rule)) {
+        if (ruleOwnerName(rule.isUser, rule.id)) {
             ++found.named;
         } else {
             found.unnamed.push_back({place, rule});
@@ -52,6 +41,21 @@ Result<> putUnnamedRules(const std::vector<UnnamedRule>& rules) {
                       (rule.isUser ? "user:" : "group:") + std::to_string(rule.id) + ":" + rule.path);
     }
     return {};
+}
+
+std::optional<std::string> ruleOwnerName(bool isUser, unsigned id) {
+    const auto& platform = fake::Platform::instance();
+    for (const auto& [name, user] : platform.users) {
+        if (isUser && static_cast<unsigned>(user.uid) == id) {
+            return name;
+        }
+    }
+    for (const auto& [name, gid] : platform.groups) {
+        if (!isUser && static_cast<unsigned>(gid) == id) {
+            return name;
+        }
+    }
+    return std::nullopt;
 }
 
 bool isRuleOwner(bool isUser, const std::string& name) {

@@ -154,6 +154,10 @@ TEST_F(HostHealth, AFirewallThatDoesNotFollowIsFound) {
     EXPECT_EQ(fetchHome(), "alice");
     std::string found = diagnosis();
     EXPECT_EQ(found, "firewall-settings-damaged: Correct the file, then run: systemctl restart veltd\n");
+    ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
+    EXPECT_NE(diagnosis(), "");
+    const std::string words = veltctl({"doctor"}).output;
+    EXPECT_TRUE(contains(words, "No rules of this system are in force")) << words;
     setFirewall("mode = drop\nports = 22 443\n");
     mend(found, "firewall-settings-damaged");
     EXPECT_EQ(diagnosis(), "");

@@ -4,6 +4,7 @@
 #include "standalone/contract/last_error.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
+#include "standalone/rules/rule_store.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"
 
@@ -56,6 +57,9 @@ protected:
         if (setgroups(0, nullptr) < 0 || setgid(carolId) < 0 || setuid(carolId) < 0 ||
             VELTFTPConfSet(record) < 0) {
             std::cerr << lastErrorSentence() << '\n';
+            _exit(1);
+        }
+        if (!makeRulesFile()) {
             _exit(1);
         }
         const auto plan = planFtpDaemon();

@@ -92,10 +92,18 @@ TEST_F(HostSettings, RulesOfAccountsWithoutANameAreShownByNumberAndSurviveAnEdit
     whole["chroot_rules"].removeIndex(0, &removed);
     ASSERT_EQ(put(whole).status, 200);
     EXPECT_EQ(platform.rules, (std::vector<std::string>{"user:1000:/home", "group:42:/docs"}));
-    const Answer refused = patch(R"({"chroot_rules":[{"type":"user","name":"#4711","path":"/home"}]})");
-    EXPECT_EQ(refused.status, 422) << "a rule for somebody who does not exist";
-    EXPECT_EQ(fieldsOf(refused), Fields{"/chroot_rules/0/name"});
-    EXPECT_EQ(platform.rules.size(), 2U);
+    ASSERT_EQ(post("/api/history/2/undo").status, 200) << "what was there before can be there again";
+    EXPECT_EQ(platform.rules,
+              (std::vector<std::string>{"user:4711:/home", "user:1000:/home", "group:42:/docs"}));
+    platform.users["back"].uid = 4711;
+    EXPECT_EQ(document()["chroot_rules"][0]["name"], "back");
+    ASSERT_EQ(post("/api/history/3/undo").status, 200) << "though the account has a name since";
+    ASSERT_EQ(post("/api/history/4/undo").status, 200);
+    EXPECT_EQ(platform.rules.size(), 3U);
+    EXPECT_TRUE(patch(R"({"chroot_rules":[{"type":"user","name":"#4711","path":"/home"},
+        {"type":"user","name":"anna","path":"/home"},{"type":"group","name":"#42","path":"/docs"}]})")
+                    .json()["changes"]
+                    .empty());
 }
 
 TEST_F(HostSettings, NullIsTheDefault) {
@@ -173,6 +181,33 @@ TEST_F(HostSettings, WhatIsStoredAlreadyIsNotJudged) {
     platform.conf.maxuploadrate = -1; // as the module takes it
     EXPECT_EQ(patch(R"({"ftp":{"timeout":500}})").status, 200);
     EXPECT_EQ(put(document()).status, 200);
+}
+
+TEST_F(HostSettings, AnAddressAtWhichNobodyReachesTheServerIsNamed) {
+    for (const char* address : {"127.0.0.1", "300.1.1.1", "224.0.0.1"}) {
+        const Answer answer = patch(std::string(R"({"ftp":{"ext_ip":")") + address + R"("}})");
+        EXPECT_EQ(answer.status, 422);
+        EXPECT_EQ(fieldsOf(answer), Fields{"/ftp/ext_ip"}) << answer.body;
+    }
+}
+
+TEST_F(HostSettings, AnOptionThatComesTwiceIsRefused) {
+    for (const char* query : {"?dry_run=true&dry_run=false", "?sessions=keep&sessions=end",
+                              "?confirm_within=5&confirm_within=6"}) {
+        EXPECT_EQ(patch(R"({"ftp":{"timeout":600}})", query).status, 400) << query;
+    }
+    EXPECT_EQ(post("/api/restart?dry_run=true&dry_run=false").status, 400);
+    EXPECT_EQ(document()["ftp"]["timeout"], 300);
+    EXPECT_TRUE(access.askedRestarts.empty());
+}
+
+TEST_F(HostSettings, OptionsInABodyAreNotOverlooked) {
+    ASSERT_EQ(patch(R"({"ftp":{"timeout":600}})").status, 200);
+    EXPECT_EQ(post("/api/history/1/undo", R"({"dry_run":true})").status, 400);
+    EXPECT_EQ(post("/api/history/1/confirm", R"({"dry_run":true})").status, 400);
+    EXPECT_EQ(post("/api/restart", R"({"service":"sftp"})").status, 400);
+    EXPECT_EQ(document()["ftp"]["timeout"], 600);
+    EXPECT_TRUE(access.askedRestarts.empty());
 }
 
 TEST_F(HostSettings, ARuleForSomebodyUnknownIsNamed) {

@@ -26,15 +26,15 @@ TEST_F(JournalHealth, AChangeThatIsOverdueIsNamed) {
     change.state = ChangeState::waiting;
     change.confirmBy = now_;
     ASSERT_TRUE(recordChange(change));
-    EXPECT_EQ(journalFindings(now_ + seconds(15)), Findings()) << "it may be at work";
+    EXPECT_EQ(journalFindings(now_ + seconds(5)), Findings()) << "it may be at work";
     EXPECT_EQ(
-        journalFindings(now_ + seconds(16)),
+        journalFindings(now_ + seconds(6)),
         (Findings{{"change-unconfirmed", Severity::error, "settings",
                    "The change 1 was not confirmed in time, but could not be taken back: it is still in "
                    "force. veltd's log has the reason, and it is tried again every half minute.",
                    "veltctl undo 1"}}));
     ASSERT_TRUE(setChangeState(1, ChangeState::superseded));
-    EXPECT_EQ(journalFindings(now_ + seconds(16)), Findings());
+    EXPECT_EQ(journalFindings(now_ + seconds(6)), Findings());
 }
 
 TEST_F(JournalHealth, ADamagedLogIsNamedAndItsCommandMendsThat) {

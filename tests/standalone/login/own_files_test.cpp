@@ -42,8 +42,8 @@ protected:
 
 TEST_F(OwnFiles, areKnownByName) {
     keep();
-    for (const char* kept :
-         {".ssh", ".profile", ".Profile", ".qmail", ".qmail-x", ".forward", ".forwarder"}) {
+    for (const char* kept : {".ssh", ".profile", ".Profile", ".qmail", ".qmail-x", ".forward", ".forwarder",
+                             ".yubico", ".dovecot.sieve", ".lessfilter", ".vnc", ".yashrc"}) {
         EXPECT_EQ(content(kept), "kept") << kept;
         EXPECT_EQ(name(kept), "kept") << kept;
     }
