@@ -98,6 +98,7 @@ std::optional<Refusal> AccessControl::authenticate(const HttpRequest& head, cons
     principal.role = token->role;
     principal.actor = token->name;
     principal.holder = "token " + token->id;
+    principal.tokenId = token->id;
     return std::nullopt;
 }
 

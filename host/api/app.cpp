@@ -105,7 +105,7 @@ void App::addRoutes(const ModuleTable& table) {
     add({restartRoute(log_)});
     add(statusRoutes(table));
     add(banRoutes(log_));
-    add(tokenRoutes(tokens_, log_));
+    add(tokenRoutes(tokens_, events_, log_));
     add(healthRoutes(health_));
     add({logRoute(), metricsRoute(metrics_, table, events_, health_), openApiRoute(openApi_), eventRoute()});
 }
@@ -140,8 +140,12 @@ bool App::asksForEvents(const HttpRequest& request) const {
     return asksFor(request, [](const Route& each) { return !each.answer; });
 }
 
-void App::addEventReader(const std::shared_ptr<EventReader>& reader) {
-    events_.add(reader);
+void App::addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) {
+    events_.add(reader, principal.tokenId);
+    // It may have been deleted since it was looked at, when the hub did not know of its reader yet.
+    if (!principal.tokenId.empty() && !tokens_.has(principal.tokenId)) {
+        reader->end();
+    }
 }
 
 HttpResponse App::failure(int status, const std::string& detail) {

@@ -48,7 +48,7 @@ public:
     bool asksForEvents(const HttpRequest& request) const override;
     void handle(HttpRequest request, const Principal& principal, Done done) override;
     HttpResponse failure(int status, const std::string& detail) override;
-    void addEventReader(const std::shared_ptr<EventReader>& reader) override;
+    void addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) override;
 
     /// Finishes the accepted requests and accepts no more.
     void stop();

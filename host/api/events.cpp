@@ -27,11 +27,21 @@ void publish(EventHub& hub, const SystemEvent& event) {
 
 } // namespace
 
-void EventHub::add(const std::shared_ptr<EventReader>& reader) {
+void EventHub::add(const std::shared_ptr<EventReader>& reader, const std::string& tokenId) {
     const std::lock_guard lock(mutex_);
     // Readers may come and go for a long time without an event.
     forgetThoseThatLeft();
-    readers_.push_back(reader);
+    readers_.push_back({reader, tokenId});
+}
+
+void EventHub::endThoseOf(const std::string& tokenId) {
+    const std::lock_guard lock(mutex_);
+    for (const Entry& each : readers_) {
+        const auto reader = each.tokenId == tokenId ? each.reader.lock() : nullptr;
+        if (reader) {
+            reader->end();
+        }
+    }
 }
 
 std::size_t EventHub::readers() {
@@ -41,7 +51,7 @@ std::size_t EventHub::readers() {
 }
 
 void EventHub::forgetThoseThatLeft() {
-    std::erase_if(readers_, [](const std::weak_ptr<EventReader>& each) { return each.expired(); });
+    std::erase_if(readers_, [](const Entry& each) { return each.reader.expired(); });
 }
 
 void EventHub::publish(const std::string& type, const Json::Value& data) {
@@ -49,8 +59,8 @@ void EventHub::publish(const std::string& type, const Json::Value& data) {
     const auto event =
         std::make_shared<const std::string>("event: " + type + "\ndata: " + toJson(data) + "\n\n");
     const std::lock_guard lock(mutex_);
-    for (const std::weak_ptr<EventReader>& each : readers_) {
-        if (const auto reader = each.lock()) {
+    for (const Entry& each : readers_) {
+        if (const auto reader = each.reader.lock()) {
             reader->deliver(event);
         }
     }

@@ -19,8 +19,11 @@ namespace velt::host {
 /// Delivers each event to everybody who reads the stream of events. Thread-safe.
 class EventHub {
 public:
-    /// The hub does not keep the reader alive.
-    void add(const std::shared_ptr<EventReader>& reader);
+    /// The hub does not keep the reader alive, who showed this token, or none.
+    void add(const std::shared_ptr<EventReader>& reader, const std::string& tokenId = "");
+
+    /// Ends the streams of those who showed this token.
+    void endThoseOf(const std::string& tokenId);
 
     /// How many are reading.
     std::size_t readers();
@@ -32,7 +35,11 @@ private:
     void forgetThoseThatLeft();
 
     std::mutex mutex_;
-    std::vector<std::weak_ptr<EventReader>> readers_;
+    struct Entry {
+        std::weak_ptr<EventReader> reader;
+        std::string tokenId;
+    };
+    std::vector<Entry> readers_;
 };
 
 /// Publishes what the platform announces, for its lifetime.

@@ -278,7 +278,7 @@ bool History::tryToTakeBack(const ChangeRecord& change) {
 
 bool History::takeBack(const ChangeRecord& change) {
     const std::string id = std::to_string(change.id);
-    const Call call{{}, {}, {Role::admin, "", "", ""}, nextRequestId()};
+    const Call call{{}, {}, {Role::admin, "", "", "", ""}, nextRequestId()};
     const auto current = readSettingsDocument(table_, call.principal);
     if (!current) {
         log_.write(call.id, current.error().message);

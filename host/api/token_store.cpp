@@ -123,6 +123,11 @@ std::vector<Token> TokenStore::tokens() const {
     return tokens_;
 }
 
+bool TokenStore::has(const std::string& id) const {
+    const std::lock_guard lock(mutex_);
+    return std::ranges::find(tokens_, id, &Token::id) != tokens_.end();
+}
+
 std::optional<Token> TokenStore::find(const std::string& token) const {
     const std::string hash = sha256(token);
     const std::lock_guard lock(mutex_);

@@ -55,6 +55,8 @@ public:
 
     std::vector<Token> tokens() const;
 
+    bool has(const std::string& id) const;
+
     /// The token with this text.
     std::optional<Token> find(const std::string& token) const;
 

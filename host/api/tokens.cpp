@@ -70,7 +70,7 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     return jsonResponse(201, value);
 }
 
-HttpResponse remove(TokenStore& store, HostLog& log, const Call& call) {
+HttpResponse remove(TokenStore& store, EventHub& events, HostLog& log, const Call& call) {
     const auto dryRun = parseDryRun(call.request.query());
     if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
         return fieldProblem(400, *bad, noneDeleted, call.id);
@@ -85,6 +85,7 @@ HttpResponse remove(TokenStore& store, HostLog& log, const Call& call) {
     if (!found || !store.remove(id)) {
         return problem(404, "There is no token with the id " + id + ".", call.id);
     }
+    events.endThoseOf(id);
     log.write(call.id, "token " + id + " deleted by " + call.principal.actor);
     writeAudit(entryOf(AuditEvent::tokenDeleted, *token), log, call);
     return {204, "", "", {}};
@@ -92,7 +93,7 @@ HttpResponse remove(TokenStore& store, HostLog& log, const Call& call) {
 
 } // namespace
 
-std::vector<Route> tokenRoutes(TokenStore& store, HostLog& log) {
+std::vector<Route> tokenRoutes(TokenStore& store, EventHub& events, HostLog& log) {
     using Kind = RequestOrder::Kind;
     return {
         {"GET", {"api", "tokens"}, true, Kind::unordered, [&store](const Call&) { return list(store); }},
@@ -105,7 +106,7 @@ std::vector<Route> tokenRoutes(TokenStore& store, HostLog& log) {
          {"api", "tokens", "*"},
          true,
          Kind::unordered,
-         [&](const Call& call) { return remove(store, log, call); }},
+         [&](const Call& call) { return remove(store, events, log, call); }},
     };
 }
 

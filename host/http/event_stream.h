@@ -33,7 +33,7 @@ public:
             stream->waitForEnd();
             stream->beat();
             // After the head, so that it is sent before any event.
-            stream->session_->handler_.addEventReader(stream);
+            stream->session_->handler_.addEventReader(stream, stream->session_->principal_);
         });
     }
 
@@ -41,6 +41,10 @@ public:
         session_->shared_.turns.add([self = this->shared_from_this(), event] {
             boost::asio::dispatch(self->strand_, [self, event] { self->push(event); });
         });
+    }
+
+    void end() override {
+        boost::asio::dispatch(strand_, [self = this->shared_from_this()] { self->close(); });
     }
 
 private:
@@ -52,7 +56,7 @@ private:
         }
         queued_ += event->size();
         if (queued_ > session_->limits_.queuedEvents) {
-            end();
+            close();
             return;
         }
         queue_.push_back(event);
@@ -67,7 +71,7 @@ private:
                                  boost::asio::bind_executor(strand_, [self = this->shared_from_this()](
                                                                          const Error& error, std::size_t) {
                                      if (error) {
-                                         self->end();
+                                         self->close();
                                          return;
                                      }
                                      self->queued_ -= self->queue_.front()->size();
@@ -87,7 +91,7 @@ private:
             boost::asio::bind_executor(strand_,
                                        [self = this->shared_from_this()](const Error& error, std::size_t) {
                                            if (error) {
-                                               self->end();
+                                               self->close();
                                            } else if (!self->ended_) {
                                                self->waitForEnd();
                                            }
@@ -105,7 +109,7 @@ private:
             }));
     }
 
-    void end() {
+    void close() {
         ended_ = true;
         heartbeat_.cancel();
         shutdown(session_->descriptor(), SHUT_RDWR);

@@ -68,7 +68,8 @@ struct Principal {
     Role role = Role::viewer;
     std::string actor;
     std::string address;
-    std::string holder; ///< whose connections are counted together; "" when they are not limited
+    std::string holder;  ///< whose connections are counted together; "" when they are not limited
+    std::string tokenId; ///< of the token that was shown; "" when there was none
 };
 
 /// The answer to a request that is refused by its head.
@@ -87,6 +88,9 @@ public:
 
     /// Sends one event, which is complete. From any thread; does not block.
     virtual void deliver(const std::shared_ptr<const std::string>& event) = 0;
+
+    /// Ends the connection. From any thread; does not block.
+    virtual void end() = 0;
 };
 
 /// What the server asks of the application, which is on a floor above and is not known here. Called by
@@ -117,7 +121,7 @@ public:
     /// The answer to what the server refuses by itself: a malformed or oversized request, an overload.
     virtual HttpResponse failure(int status, const std::string& detail) = 0;
 
-    virtual void addEventReader(const std::shared_ptr<EventReader>& reader) = 0;
+    virtual void addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) = 0;
 };
 
 } // namespace velt::host

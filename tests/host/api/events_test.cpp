@@ -4,6 +4,7 @@
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
+#include "tests/support/waiting.h"
 
 #include <sys/socket.h>
 
@@ -12,7 +13,9 @@
 namespace {
 
 using std::chrono::milliseconds;
+using std::chrono::seconds;
 using velt::LogEntry;
+using velt::test::waitUntil;
 
 const std::string sftpSet = "/api/VELT.Core.FileServ.FTP.SFTP/v1/set";
 
@@ -100,6 +103,7 @@ TEST(Events, ReadersThatLeaveBeforeAnyEventAreForgotten) {
     class Reader : public velt::host::EventReader {
     public:
         void deliver(const std::shared_ptr<const std::string>& event) override { last = *event; }
+        void end() override {}
         std::string last;
     };
     velt::host::EventHub hub;
@@ -128,6 +132,20 @@ TEST_F(HostEvents, StreamsOfEventsAreCounted) {
     EXPECT_NE(get("/metrics").body.find("\nvelt_event_readers 1\n"), std::string::npos);
 }
 
+TEST_F(HostEvents, ADeletedTokenReadsNoFurther) {
+    start();
+    Client others = listen();
+    const Json::Value token = post("/api/tokens", R"({"name":"bench","role":"viewer"})").json();
+    Client events = connect();
+    events.send(requestText("GET", "/events", "Authorization: Bearer " + token["token"].asString() + "\r\n"));
+    ASSERT_NE(events.readUntil(": connected\n\n"), "");
+    ASSERT_EQ(ask("DELETE", "/api/tokens/" + token["id"].asString(), admin).status, 204);
+    EXPECT_TRUE(waitUntil([&] { return server->connections() == 1; }, seconds(5)));
+    access.announce("ftpd", "stop");
+    EXPECT_EQ(events.readUntil("event: service"), "") << "it ends without a further event";
+    EXPECT_NE(others.readUntil("event: service"), "");
+}
+
 TEST_F(HostEvents, AReaderThatLagsIsLeftBehind) {
     limits.queuedEvents = 50'000;
     start();
@@ -153,7 +171,7 @@ TEST_F(HostEvents, AStopEndsStreamsAndIdleConnectionsAtOnce) {
     EXPECT_EQ(idle.ask(requestText("GET", "/healthz", admin)).status, 200);
     const auto begin = std::chrono::steady_clock::now();
     stop();
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(3));
+    EXPECT_LT(std::chrono::steady_clock::now() - begin, seconds(3));
     EXPECT_TRUE(events.ended());
     EXPECT_TRUE(idle.ended());
     EXPECT_FALSE(Client::unixSocket(socketPath).connected());
