@@ -48,11 +48,6 @@ bool changesRules(const std::vector<StagedFile>& files) {
     return std::ranges::find(files, paths::chrootRules, &StagedFile::name) != files.end();
 }
 
-bool startsFtp(const std::vector<DaemonRequests::Wish>& wishes) {
-    return std::ranges::any_of(
-        wishes, [](const DaemonRequests::Wish& wish) { return wish.start && wish.daemon == &ftpDaemon; });
-}
-
 class StagedChange final : public SettingsChange {
 public:
     StagedChange(Former former, std::unique_ptr<Staging> staging)
@@ -97,9 +92,6 @@ private:
         VELT_ASSIGN_OR_RETURN(request.files, staging_->files.changes());
         request.wishes = staging_->requests.wishes();
         request.madeByStarts = staging_->requests.missingKeys();
-        if (startsFtp(request.wishes) && !fileExists(statePath(paths::chrootRules))) {
-            request.madeByStarts.push_back("chroot rules");
-        }
         request.firewall = staging_->requests.firewall();
         request.openBefore = former_.openPorts;
         VELT_ASSIGN_OR_RETURN(request.openAfter, openPorts());
