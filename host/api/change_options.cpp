@@ -11,7 +11,6 @@ namespace velt::host {
 namespace {
 
 constexpr std::int64_t longestConfirmation = 86400;
-constexpr const char* onlyOne = "one value, not several";
 
 /// `take` returns false for a value other than the expected.
 struct Option {
@@ -55,7 +54,7 @@ std::variant<ChangeOptions, FieldError> parseChangeOptions(const std::string& qu
     ChangeOptions options;
     const auto parameters = queryParameters(query);
     if (const auto repeated = repeatedKey(parameters)) {
-        return FieldError{*repeated, onlyOne};
+        return FieldError{*repeated, oneValue};
     }
     for (const auto& [key, value] : parameters) {
         const auto* const option = std::ranges::find(known, key, &Option::key);
@@ -73,7 +72,7 @@ std::variant<bool, FieldError> parseDryRun(const std::string& query) {
     ChangeOptions options;
     const auto parameters = queryParameters(query);
     if (const auto repeated = repeatedKey(parameters)) {
-        return FieldError{*repeated, onlyOne};
+        return FieldError{*repeated, oneValue};
     }
     for (const auto& [key, value] : parameters) {
         if (key != known[0].key) {

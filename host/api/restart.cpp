@@ -39,7 +39,7 @@ std::variant<Wish, FieldError> wishIn(const std::string& query) {
     Wish wish;
     const auto parameters = queryParameters(query);
     if (const auto repeated = repeatedKey(parameters)) {
-        return FieldError{*repeated, "one value, not several"};
+        return FieldError{*repeated, oneValue};
     }
     for (const auto& [key, value] : parameters) {
         if (key == "service" && value && isService(*value)) {

@@ -43,6 +43,9 @@ Result<std::optional<Json::Value>> allRules(const Json::Value& named) {
 }
 
 Json::Value withNames(Json::Value document) {
+    if (!document.isMember(std::string(rulesSection))) {
+        return document;
+    }
     Json::Value& rules = document[std::string(rulesSection)];
     for (Json::ArrayIndex i = 0; rules.isArray() && i < rules.size(); ++i) {
         if (isUnnamed(rules[i])) {

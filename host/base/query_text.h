@@ -19,6 +19,9 @@ std::vector<QueryParameter> queryParameters(const std::string& query);
 /// A key that comes more than once, so that nobody can tell which value counts; nothing when there is none.
 std::optional<std::string> repeatedKey(const std::vector<QueryParameter>& parameters);
 
+/// What is expected of such a key.
+inline constexpr const char* oneValue = "one value, not several";
+
 } // namespace velt::host
 
 #endif
