@@ -1,5 +1,8 @@
 #include "standalone/login/file_functions.h"
 
+#include "privs.h"
+
+#include "standalone/login/access_files.h"
 #include "standalone/login/place.h"
 
 #include <sys/stat.h>
@@ -7,6 +10,29 @@
 static int leave(struct velt_place* place, int result) {
     velt_close_place(place);
     return result;
+}
+
+static void end_session(void) {
+    pr_log_pri(PR_LOG_NOTICE, "session of '%s' ended: the shares or rules have changed since its login",
+               session.user);
+    pr_response_send(R_421, "The shares or rules have changed: log in again.");
+    pr_session_end(0);
+}
+
+/* For names that are made, moved or removed. A session that is older than a share knows nothing of the
+ * folders on the way to it, and one of them, once moved, would show to later logins what they may not see. */
+static int open_to_rename(struct velt_place* place, const char* path) {
+    int changed = FALSE;
+
+    PRIVS_ROOT
+    changed = velt_access_files_changed();
+    PRIVS_RELINQUISH
+    if (changed) {
+        end_session();
+        errno = EACCES;
+        return -1;
+    }
+    return velt_open_place(place, path, velt_changes_name);
 }
 
 static int open_to_change(const char* path, int flags) {
@@ -44,7 +70,7 @@ static int make_folder(pr_fs_t* fs, const char* path, mode_t mode) {
     struct velt_place place;
 
     (void)fs;
-    if (velt_open_place(&place, path, velt_changes_name) < 0) {
+    if (open_to_rename(&place, path) < 0) {
         return -1;
     }
     return leave(&place, mkdirat(place.folder, place.name, mode));
@@ -53,7 +79,7 @@ static int make_folder(pr_fs_t* fs, const char* path, mode_t mode) {
 static int remove_place(const char* path, int flags) {
     struct velt_place place;
 
-    if (velt_open_place(&place, path, velt_changes_name) < 0) {
+    if (open_to_rename(&place, path) < 0) {
         return -1;
     }
     return leave(&place, unlinkat(place.folder, place.name, flags));
@@ -86,7 +112,7 @@ static int move_file(pr_fs_t* fs, const char* from_path, const char* to_path) {
     struct velt_place to;
 
     (void)fs;
-    if (velt_open_place(&from, from_path, velt_changes_name) < 0) {
+    if (open_to_rename(&from, from_path) < 0) {
         return -1;
     }
     int result = velt_open_place(&to, to_path, velt_changes_name);

@@ -11,6 +11,7 @@
 #include "conf.h"
 #include "privs.h"
 
+#include "standalone/login/access_files.h"
 #include "standalone/login/file_functions.h"
 #include "standalone/login/login_program.h"
 #include "standalone/login/main_process.h"
@@ -96,6 +97,8 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
             (void)snprintf(words, sizeof(words), "cannot make a mount namespace: %s", strerror(errno));
         } else if (!keep_homes(pw->pw_dir)) {
             (void)snprintf(words, sizeof(words), "cannot look at the home: %s", strerror(errno));
+        } else if (velt_note_access_files(c->argv[1]) < 0) {
+            (void)snprintf(words, sizeof(words), "cannot look at the shares and rules: %s", strerror(errno));
         } else {
             good = velt_run_login_program(arguments, longest_run, words, sizeof(words));
         }

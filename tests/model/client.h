@@ -28,6 +28,9 @@ public:
     /// The rest is for those who are.
     virtual bool isLoggedIn() const = 0;
 
+    /// Whether the server ended the session at the last step, and said so.
+    virtual bool hasEnded() const = 0;
+
     virtual bool enter(const std::string& path) = 0;
     virtual std::optional<std::set<std::string>> list(const std::string& path, Listing how) = 0;
     virtual std::optional<std::string> read(const std::string& path) = 0;

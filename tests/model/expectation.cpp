@@ -234,6 +234,11 @@ Expectation Oracle::changeMode(const std::string& path, const std::string& mode)
 
 } // namespace
 
+bool changesNames(const Step& step) {
+    static const std::set<std::string> verbs{"make", "remove", "remove-folder", "rename"};
+    return verbs.contains(step.at(0));
+}
+
 Expectation expect(const Tree& tree, const View& view, const Account& account, const Step& step,
                    const std::string& data) {
     const Oracle oracle(tree, view, account, data);

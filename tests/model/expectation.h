@@ -20,6 +20,10 @@ struct Expectation {
     std::optional<Tree> after;   ///< nothing: all stays as it is
 };
 
+/// Whether the step makes a folder, or moves or removes something. A session that is older than the last
+/// change of the shares or rules may not do that any more.
+bool changesNames(const Step& step);
+
 /// Of a step like "read SESSION PATH" in a view of this account. `data` is what a file gets that is written.
 Expectation expect(const Tree& tree, const View& view, const Account& account, const Step& step,
                    const std::string& data);

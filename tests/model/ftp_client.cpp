@@ -18,6 +18,7 @@ public:
     }
 
     bool isLoggedIn() const override { return loggedIn_; }
+    bool hasEnded() const override { return ended_; }
     bool enter(const std::string& path) override { return done("CWD " + path); }
     std::optional<std::set<std::string>> list(const std::string& path, Listing how) override;
     std::optional<std::string> read(const std::string& path) override {
@@ -45,11 +46,13 @@ private:
         if (code == 0) {
             throw std::runtime_error("the server ended the session at " + command);
         }
+        ended_ = code == 421;
         return code < 400;
     }
 
     test::FtpSession session_;
     bool loggedIn_ = false;
+    bool ended_ = false;
 };
 
 // The name in a line of LIST, MLSD or NLST.

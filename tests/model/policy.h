@@ -38,6 +38,7 @@ struct World {
     std::vector<Share> shares;
     std::vector<Rule> rules;
     Switches switches;
+    long changes = 0; ///< how often the shares or rules were written
 };
 
 /// "ftp" is the account of anonymous users.

@@ -86,6 +86,7 @@ void Runner::administer(const Step& step) {
         setShare(step);
     } else if (verb == "unshare") {
         std::erase_if(world_.shares, [&](const Share& share) { return share.name == step.at(1); });
+        world_.changes++;
         real_.storeShares(world_.shares);
     } else if (verb == "rules") {
         setRules(step);
@@ -112,6 +113,7 @@ void Runner::setShare(const Step& step) {
     }
     std::erase_if(world_.shares, [&](const Share& one) { return one.name == share.name; });
     world_.shares.push_back(std::move(share));
+    world_.changes++;
     real_.storeShares(world_.shares);
 }
 
@@ -121,6 +123,7 @@ void Runner::setRules(const Step& step) {
         const auto [who, path] = splitPair(step[i]);
         world_.rules.push_back({who, path});
     }
+    world_.changes++;
     real_.storeRules(world_.rules);
 }
 
@@ -134,7 +137,7 @@ std::string Runner::logIn(const Step& step) {
         return view ? "was refused, and must be allowed" : "was allowed, and must be refused";
     }
     if (view) {
-        sessions_.emplace(step[1], Session{account, std::move(*view), std::move(client)});
+        sessions_.emplace(step[1], Session{account, std::move(*view), world_.changes, std::move(client)});
     } else {
         ended_.push_back(std::move(client));
     }
@@ -150,7 +153,9 @@ void Runner::logOut(const std::string& session) {
 
 std::string Runner::ask(const Step& step, Session& session) {
     const std::string data = "#" + std::to_string(++written_) + ";";
-    const Expectation expected = expect(world_.tree, session.view, session.account, step, data);
+    const bool mayEnd = session.changes != world_.changes && changesNames(step);
+    const Expectation expected =
+        mayEnd ? Expectation() : expect(world_.tree, session.view, session.account, step, data);
     Outcome outcome;
     try {
         outcome = doStep(*session.client, step, data);
@@ -166,6 +171,10 @@ std::string Runner::ask(const Step& step, Session& session) {
         what = disagreement(world_.tree, expected, outcome);
     }
     world_.tree = std::move(outcome.after);
+    if (session.client->hasEnded()) {
+        what = mayEnd || !what.empty() ? what : "ended the session";
+        logOut(step[1]);
+    }
     return what;
 }
 

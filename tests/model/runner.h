@@ -10,6 +10,7 @@ namespace velt::model {
 struct Session {
     Account account;
     View view;
+    long changes = 0; ///< of the world, at the login
     std::unique_ptr<Client> client;
 };
 

@@ -24,6 +24,8 @@ namespace {
 
 class LoginModule : public testing::Test {
 protected:
+    void SetUp() override { folder_.write("etc/velt/chroot_rules", ""); }
+
     std::string script(const std::string& text) {
         const auto file = folder_.write("program", "#!/bin/sh\n" + text);
         chmod(file.c_str(), 0755);
@@ -89,6 +91,26 @@ TEST_F(LoginModule, keepsTheFilesOfTheHome) {
     home_ = folder_.path() / "another";
     ASSERT_EQ(logIn(script("")), login_granted);
     EXPECT_TRUE(UniqueFd(open_as_the_daemon(profile.c_str(), O_WRONLY | O_CREAT)));
+}
+
+TEST_F(LoginModule, refusesWhereItCannotKnowWhenRulesChange) {
+    std::filesystem::remove_all(folder_.path() / "etc");
+    EXPECT_EQ(logIn(script("exit 0\n")), login_wrong);
+    EXPECT_NE(std::string(logged()).find("cannot look at the shares and rules: "), std::string::npos)
+        << logged();
+    EXPECT_EQ(rights_taken(), 0);
+}
+
+TEST_F(LoginModule, movesNothingAfterAChangeOfTheRules) {
+    const std::string from = folder_.write("from", "").string();
+    const std::string to = folder_.path() / "to";
+    ASSERT_EQ(logIn(script("exit 0\n")), login_granted);
+    EXPECT_EQ(move_as_the_daemon(from.c_str(), to.c_str()), 0);
+    folder_.write("etc/velt/chroot_rules", "another");
+    EXPECT_EQ(move_as_the_daemon(to.c_str(), from.c_str()), -1);
+    EXPECT_STREQ(logged(), "session of 'alice' ended: the shares or rules have changed since its login");
+    EXPECT_TRUE(std::filesystem::exists(to));
+    EXPECT_EQ(rights_taken(), 0);
 }
 
 TEST_F(LoginModule, doesNothingForAWrongPassword) {

@@ -26,6 +26,7 @@ class ModuleFaults : public testing::Test {
 protected:
     void SetUp() override {
         fs::create_directory(home_);
+        root_.write("etc/velt/chroot_rules", "");
         bringBack();
         script("exit 0\n");
     }

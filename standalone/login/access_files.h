@@ -1,0 +1,16 @@
+/* The files that say who may see what: the shares with their grants, and the chroot rules. What a session
+ * sees was made from them once, at its login. A session that knows an older world could move folders on which
+ * the views of later logins depend. */
+#ifndef VELT_STANDALONE_LOGIN_ACCESS_FILES_H
+#define VELT_STANDALONE_LOGIN_ACCESS_FILES_H
+
+/* Notes what these files below the state root are now, in place of what was noted before. Called before the
+ * view is made, and before the root directory changes. 0, or -1 with errno. */
+int velt_note_access_files(const char* state_root);
+
+/* Whether they are others than those that were noted: written, replaced, made or removed since, or impossible
+ * to look at. Works after the change of the root directory too, with root's rights or where everybody may
+ * search their folder. */
+int velt_access_files_changed(void);
+
+#endif
