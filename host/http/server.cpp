@@ -2,14 +2,13 @@
 
 #include "host/http/event_stream.h"
 #include "host/http/session.h"
+#include "host/http/tls_context.h"
 
 #include <boost/asio/basic_socket_acceptor.hpp>
 #include <boost/asio/executor_work_guard.hpp>
-#include <boost/asio/ssl/context.hpp>
 
 #include <netinet/in.h>
 #include <netinet/tcp.h>
-#include <openssl/ssl.h>
 #include <unistd.h>
 
 #include <functional>
@@ -27,25 +26,6 @@ using Acceptor = asio::basic_socket_acceptor<asio::generic::stream_protocol, Exe
 constexpr std::chrono::milliseconds acceptPause{50};
 /// How many connections beyond the limit get a 503.
 constexpr std::size_t refusedConnections = 64;
-
-std::unique_ptr<asio::ssl::context> makeTlsContext(const TlsFiles& files) {
-    if (files.certificate.empty()) {
-        return nullptr;
-    }
-    auto context = std::make_unique<asio::ssl::context>(asio::ssl::context::tls_server);
-    SSL_CTX_set_min_proto_version(context->native_handle(), TLS1_2_VERSION);
-    SSL_CTX_set_options(context->native_handle(), SSL_OP_NO_RENEGOTIATION | SSL_OP_NO_COMPRESSION);
-    Error error;
-    context->use_certificate_chain_file(files.certificate.string(), error);
-    if (!error) {
-        context->use_private_key_file(files.key.string(), asio::ssl::context::pem, error);
-    }
-    if (error) {
-        throw ListenError("Cannot use the TLS certificate " + files.certificate.string() + " with the key " +
-                          files.key.string() + ": " + error.message() + ".");
-    }
-    return context;
-}
 
 } // namespace
 

@@ -52,8 +52,8 @@ std::string dayOf(TimePoint time) {
     return utcText(time, "%Y-%m-%d %H:%M UTC");
 }
 
-/// What is wrong with files of which no certificate can be had, for the reason given.
-Finding unusable(const Error& reason) {
+/// What is wrong with the administrator's files, of which no certificate can be had for the reason given.
+Finding unusableGiven(const Error& reason) {
     const auto file = statePath(paths::givenCertificate);
     const auto keyFile = statePath(paths::givenKey);
     const CertificateOwner certificate = readCertificate(file);
@@ -73,6 +73,19 @@ Finding unusable(const Error& reason) {
                    "The key " + keyFile.string() + " does not belong to the certificate " + file.string() +
                        ".",
                    "Put the key of this certificate in place, then run: veltctl restart ftp");
+}
+
+/// The same for the self-signed one, which the next start makes anew unless its key is merely open to others.
+Finding unusableOwn(const Error& reason) {
+    const std::string close = closeKeyCommand(statePath(paths::ownKey));
+    return finding("certificate-unusable", Severity::error, reason.message,
+                   close + (close.empty() ? "" : " && ") + "veltctl restart ftp");
+}
+
+Finding unusable(const Error& reason) {
+    const bool given =
+        fileExists(statePath(paths::givenCertificate)) || fileExists(statePath(paths::givenKey));
+    return given ? unusableGiven(reason) : unusableOwn(reason);
 }
 
 bool isGiven(const ServerCertificate& certificate) {

@@ -97,7 +97,7 @@ Result<> checkPrivate(const std::filesystem::path& key) {
                          : Result<>();
 }
 
-Result<ServerCertificate> loadGiven(const Pair& pair) {
+Result<ServerCertificate> loadPrivate(const Pair& pair) {
     VELT_ASSIGN_OR_RETURN(auto certificate, load(pair));
     VELT_RETURN_IF_ERROR(checkPrivate(pair.key));
     return certificate;
@@ -166,7 +166,7 @@ Result<ServerCertificate> serverCertificate() {
     const Pair given = givenPair();
     VELT_ASSIGN_OR_RETURN(const bool isGiven, isThere(given));
     if (isGiven) {
-        return loadGiven(given);
+        return loadPrivate(given);
     }
     const Pair own = ownPair();
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
@@ -175,7 +175,7 @@ Result<ServerCertificate> serverCertificate() {
         VELT_RETURN_IF_ERROR(perform(Effect::store, "certificate", [&] { return makeOwn(own); }));
         VELT_ASSIGN_OR_RETURN(usable, isUsable(own));
     }
-    return usable ? load(own) : throwAway();
+    return usable ? loadPrivate(own) : throwAway();
 }
 
 Result<std::optional<ServerCertificate>> storedCertificate() {
@@ -186,7 +186,7 @@ Result<std::optional<ServerCertificate>> storedCertificate() {
     if (!isGiven && !isOwn) {
         return std::optional<ServerCertificate>();
     }
-    VELT_ASSIGN_OR_RETURN(auto certificate, isGiven ? loadGiven(given) : load(own));
+    VELT_ASSIGN_OR_RETURN(auto certificate, loadPrivate(isGiven ? given : own));
     return std::optional(std::move(certificate));
 }
 

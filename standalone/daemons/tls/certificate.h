@@ -26,8 +26,8 @@ struct ServerCertificate {
 /// else a self-signed one, made at the first call and again once it has expired. Where the thread's hook
 /// leaves the store of it undone, a throw-away one that is gone with the result. Fails when a file cannot be
 /// read or written, key and certificate do not belong together, the kind of key is neither RSA nor an
-/// elliptic curve, or others than the owner (root or this process's user) and the group may read the given
-/// key, or others than the owner may write it. Thread-safe.
+/// elliptic curve, or others than the owner (root or this process's user) and the group may read the key, or
+/// others than the owner may write it. Thread-safe.
 Result<ServerCertificate> serverCertificate();
 
 /// The certificate that is stored, read and checked in the same way, and nothing made. Nothing when none was

@@ -8,8 +8,10 @@
 #include <openssl/pem.h>
 #include <openssl/ssl.h>
 #include <openssl/x509.h>
+#include <unistd.h>
 
 #include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <memory>
 
@@ -36,6 +38,7 @@ void makeCertificate(const velt::host::TlsFiles& files) {
     const Owner<std::FILE> keyFile(std::fopen(files.key.c_str(), "w"),
                                    [](std::FILE* file) { std::fclose(file); });
     PEM_write_PrivateKey(keyFile.get(), key.get(), nullptr, nullptr, 0, nullptr, nullptr);
+    std::filesystem::permissions(files.key, std::filesystem::perms::owner_read);
 }
 
 class HostTls : public HostTest {
@@ -115,6 +118,33 @@ TEST_F(HostTls, EventsComeOverTls) {
 
 TEST_F(HostTls, FilesThatCannotBeUsedStopTheStart) {
     std::ofstream(tls.key) << "no key";
+    EXPECT_THROW(start(), velt::host::ListenError);
+    app.reset();
+}
+
+TEST_F(HostTls, AKeyThatOthersMayReadOrWriteStopsTheStart) {
+    using std::filesystem::perms;
+    for (const perms open : {perms::others_read, perms::others_write, perms::group_write}) {
+        std::filesystem::permissions(tls.key, perms::owner_read | open);
+        try {
+            start();
+            ADD_FAILURE() << "served with a key of mode " << std::oct << static_cast<int>(open);
+        } catch (const velt::host::ListenError& error) {
+            EXPECT_EQ(error.what(), "The key " + tls.key.string() +
+                                        " is open to other users; mend it with: chmod 640 " +
+                                        tls.key.string());
+        }
+        app.reset();
+    }
+    std::filesystem::permissions(tls.key, perms::owner_read | perms::group_read);
+    EXPECT_NO_THROW(start());
+}
+
+TEST_F(HostTls, AKeyOfAnotherUserStopsTheStart) {
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "needs root's rights to give a file away";
+    }
+    ASSERT_EQ(chown(tls.key.c_str(), 1234, 1234), 0);
     EXPECT_THROW(start(), velt::host::ListenError);
     app.reset();
 }

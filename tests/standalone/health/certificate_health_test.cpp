@@ -94,6 +94,22 @@ TEST_F(CertificateHealth, OneOfOurOwnIsMadeAgain) {
               "rm " + (root_.path() / "var/lib/velt/tls/server.crt").string() + " && veltctl restart ftp");
 }
 
+TEST_F(CertificateHealth, OneOfOurOwnThatCannotBeUsedIsMendedByARestart) {
+    ASSERT_TRUE(serverCertificate());
+    const std::string key = (root_.path() / "var/lib/velt/tls/server.key").string();
+    ::chmod(key.c_str(), 0644);
+    const std::string close = "chmod 640 " + key;
+    EXPECT_EQ(found(), (Findings{{"certificate-unusable", Severity::error, "ftp",
+                                  key + " is open to other users; mend it with: " + close + ".",
+                                  close + " && veltctl restart ftp"}}));
+    ::chmod(key.c_str(), 0600);
+    root_.write("var/lib/velt/tls/server.crt", made().certificate);
+    EXPECT_EQ(found(), (Findings{{"certificate-unusable", Severity::error, "ftp",
+                                  key + " does not match the certificate.", "veltctl restart ftp"}}));
+    ASSERT_TRUE(serverCertificate());
+    EXPECT_EQ(found(), Findings());
+}
+
 TEST_F(CertificateHealth, NamesThatVerifyNothingAreTold) {
     const auto nameless = made({"not a name", {}});
     give(nameless, nameless);
@@ -103,7 +119,7 @@ TEST_F(CertificateHealth, NamesThatVerifyNothingAreTold) {
 TEST_F(CertificateHealth, OneOfOurOwnForAnotherHostIsTold) {
     const auto other = made({"another.example", {}});
     root_.write("var/lib/velt/tls/server.crt", other.certificate);
-    root_.write("var/lib/velt/tls/server.key", other.key);
+    ::chmod(root_.write("var/lib/velt/tls/server.key", other.key).c_str(), 0600);
     EXPECT_EQ(summary(found()), "notice certificate-other-name");
 }
 

@@ -149,6 +149,16 @@ TEST_F(ServerCertificates, withAKeyThatOthersMayReadAreRefused) {
     }
 }
 
+TEST_F(ServerCertificates, ofThisServerWithAKeyThatOthersMayReadAreRefused) {
+    const auto made = serverCertificate();
+    ASSERT_EQ(messageOf(made), "");
+    ASSERT_EQ(chmod(made->key.c_str(), 0644), 0);
+    expectRefusal("is open to other users; mend it with: chmod 640 " + made->key.string());
+    EXPECT_FALSE(storedCertificate());
+    ASSERT_EQ(chmod(made->key.c_str(), 0600), 0);
+    EXPECT_EQ(serverCertificate()->fingerprint, made->fingerprint);
+}
+
 TEST_F(ServerCertificates, withAKeyThatAsksForAPassphraseAreRefused) {
     const auto pair = makeSelfSigned({"given", {}});
     give(*pair);
