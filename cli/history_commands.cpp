@@ -10,6 +10,7 @@
 #include <memory>
 #include <ostream>
 #include <string>
+#include <vector>
 
 namespace velt::cli {
 
@@ -66,32 +67,49 @@ void showChange(Context& context, long long id) {
     table.write(context.console.out);
 }
 
-/// The change that is meant: the named one, else the newest that satisfies the condition.
-template<class Condition>
-long long meant(Context& context, long long id, const Condition& condition, const char* what) {
-    if (id > 0) {
-        return id;
-    }
+/// The newest changes of which one may be meant.
+template<class Condition> std::vector<long long> candidates(Context& context, const Condition& condition) {
     const Json::Value answer = context.api.get("/api/history?limit=100");
+    std::vector<long long> found;
     for (const Json::Value& change : answer["changes"]) {
         if (condition(textAt(change, "state"))) {
-            return change["id"].asInt64();
+            found.push_back(change["id"].asInt64());
         }
     }
-    throw Failure(ExitCode::refused, std::string("There is no change ") + what + ".",
-                  "'veltctl history' lists the changes.");
+    return found;
+}
+
+Failure noChange(const char* what) {
+    return {ExitCode::refused, std::string("There is no change ") + what + ".",
+            "'veltctl history' lists the changes."};
+}
+
+long long changeToUndo(Context& context) {
+    const auto found = candidates(context, [](const std::string& state) { return state != "undone"; });
+    return found.empty() ? throw noChange("to undo") : found.front();
+}
+
+long long changeToConfirm(Context& context) {
+    const auto found = candidates(context, [](const std::string& state) { return state == "waiting"; });
+    if (found.size() > 1) { // whoever sees one of them would let the others be taken back
+        std::string ids;
+        for (const long long id : found) {
+            ids += (ids.empty() ? "" : ", ") + std::to_string(id);
+        }
+        throw Failure(ExitCode::refused, "Several changes wait for their confirmation: " + ids + ".",
+                      "Name the one to keep: veltctl confirm " + std::to_string(found.front()));
+    }
+    return found.empty() ? throw noChange("to confirm") : found.front();
 }
 
 void undo(Context& context, const HistoryOptions& options) {
-    const long long id = meant(
-        context, options.id, [](const std::string& state) { return state != "undone"; }, "to undo");
+    const long long id = options.id > 0 ? options.id : changeToUndo(context);
     const std::string path = "/api/history/" + std::to_string(id) + "/undo" + options.change.query();
     writeReport(context, context.api.post(path, Json::objectValue));
 }
 
 void confirm(Context& context, const HistoryOptions& options) {
-    const long long id = meant(
-        context, options.id, [](const std::string& state) { return state == "waiting"; }, "to confirm");
+    const long long id = options.id > 0 ? options.id : changeToConfirm(context);
     const Json::Value answer = context.api.post("/api/history/" + std::to_string(id) + "/confirm" +
                                                     dryRunQuery(options.change.dryRun),
                                                 Json::objectValue);
@@ -128,7 +146,7 @@ void addHistoryCommands(CLI::App& app, Command& chosen) {
     onWords(back, chosen, [options](Context& context) { undo(context, *options); });
 
     CLI::App* keep = app.add_subcommand("confirm", "Keep a change that else is taken back");
-    addId(keep, *options, "The change (default: the newest that waits)");
+    addId(keep, *options, "The change (default: the one that waits)");
     addDryRun(keep, options->change.dryRun);
     onWords(keep, chosen, [options](Context& context) { confirm(context, *options); });
 }

@@ -33,9 +33,13 @@ void restart(Context& context, const RestartOptions& options) {
     }
     for (const Json::Value& service : answer["services"]) {
         const int kept = service["kept"].asInt();
-        context.console.out << printable(textAt(service, "service")) << ": restarted, " << kept
-                            << (kept == 1 ? " session goes on, " : " sessions go on, ")
-                            << service["ended"].asInt() << " ended\n";
+        const int ended = service["ended"].asInt();
+        context.console.out << printable(textAt(service, "service")) << ": restarted";
+        if (kept != 0 || ended != 0) {
+            context.console.out << ", " << kept << (kept == 1 ? " session goes on, " : " sessions go on, ")
+                                << ended << " ended";
+        }
+        context.console.out << '\n';
     }
     context.console.out << "The services that are on run with what is stored now.\n";
 }

@@ -123,7 +123,7 @@ HttpResponse AllSettings::change(const Call& call, bool isPatch) {
     }
     const auto before = readSettingsDocument(table_, call.principal);
     if (!before) {
-        return failedUnchanged(before.error().message, call.id);
+        return failedUnchanged(before.error(), call.id);
     }
     const Json::Value wanted = withNames(isPatch ? patched(*before, *body) : *body);
     return store(*before, wanted, "settings", std::get<ChangeOptions>(options), call);
@@ -171,13 +171,13 @@ std::optional<HttpResponse> AllSettings::ask(const Json::Value& before, const Js
         }
         if (each.section == rulesSection) {
             if (const auto stored = storeUnnamedRules(wanted[each.section]); !stored) {
-                return failedUnchanged(stored.error().message, call.id);
+                return failedUnchanged(stored.error(), call.id);
             }
         }
     }
     const auto after = readSettingsDocument(table_, call.principal);
     if (!after) {
-        return failedUnchanged(after.error().message, call.id);
+        return failedUnchanged(after.error(), call.id);
     }
     const auto ignored = ignoredParts(wanted, *after);
     return ignored.empty() ? std::nullopt : std::optional(refused(ignored, call.id));

@@ -5,6 +5,7 @@
 #include "base/utc_text.h"
 #include "host/api/audit.h"
 #include "host/api/change_summary.h"
+#include "host/api/failure_kind.h"
 #include "host/api/problem.h"
 #include "host/api/service_status.h"
 #include "host/base/json.h"
@@ -25,13 +26,18 @@ std::string whoAsked(const Principal& principal) {
 
 /// A change that the platform could not do, though the module accepted it.
 HttpResponse notDone(const ChangeOutcome& outcome, const std::string& requestId) {
-    const bool taken = outcome.undone && outcome.failure->number == ErrorNumber::portTaken;
-    const std::string extent = outcome.undone ? " All is as it was before." : "";
-    return problemWith(taken ? 409 : 500,
-                       jsonObject({{"title", outcome.undone ? "The change was taken back"
-                                                            : "The change could be taken back only in part"},
-                                   {"detail", outcome.failure->message + extent},
-                                   {"changed", !outcome.undone}}),
+    if (!outcome.undone) { // nobody who asks again would mend that
+        return problemWith(500,
+                           jsonObject({{"title", "The change could be taken back only in part"},
+                                       {"detail", outcome.failure->message},
+                                       {"changed", true}}),
+                           requestId);
+    }
+    const FailureKind kind = kindOf(outcome.failure->number);
+    return problemWith(kind.status,
+                       jsonObject({{"title", kind.title},
+                                   {"detail", outcome.failure->message + " All is as it was before."},
+                                   {"changed", false}}),
                        requestId);
 }
 
@@ -86,7 +92,7 @@ std::variant<ChangeReport, HttpResponse> Changes::make(const ChangeRequest& requ
     const Findings known = judgeSettings();
     auto change = SettingsChange::begin(request.ports);
     if (!change) {
-        return failedUnchanged(change.error().message, call.id);
+        return failedUnchanged(change.error(), call.id);
     }
     if (auto refusal = ask()) {
         return std::move(*refusal);
@@ -110,7 +116,7 @@ std::optional<HttpResponse> Changes::preview(SettingsChange& change, const Chang
                                              ChangeReport& report) {
     const auto plan = change.plan(request.options.sessions);
     if (!plan) {
-        return failedUnchanged(plan.error().message, request.call.id);
+        return failedUnchanged(plan.error(), request.call.id);
     }
     report.steps = plan->steps;
     report.sessionsEnded = plan->sessionsEnded;
@@ -123,7 +129,7 @@ std::optional<HttpResponse> Changes::commit(SettingsChange& change, const Change
     if (request.options.confirmWithin && !report.changes.empty()) {
         const auto recorded = record(request, ChangeState::waiting, report);
         if (!recorded) {
-            return failedUnchanged(recorded.error().message, request.call.id);
+            return failedUnchanged(recorded.error(), request.call.id);
         }
     }
     const ChangeOutcome outcome = change.commit(request.options.sessions);

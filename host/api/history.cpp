@@ -232,7 +232,7 @@ HttpResponse History::undo(const Call& call) {
     }
     const auto current = readSettingsDocument(table_, call.principal);
     if (!current) {
-        return failedUnchanged(current.error().message, call.id);
+        return failedUnchanged(current.error(), call.id);
     }
     const auto [wanted, conflicts] = undoing(*record, *current);
     if (!conflicts.empty()) {

@@ -1,6 +1,7 @@
 #include "host/api/problem.h"
 
 #include "base/json_value.h"
+#include "host/api/failure_kind.h"
 #include "host/base/json.h"
 #include "host/http/response_text.h"
 
@@ -12,12 +13,17 @@ HttpResponse problem(int status, const std::string& detail, const std::string& r
     return problemWith(status, jsonObject({{"detail", detail}}), requestId);
 }
 
-HttpResponse failedUnchanged(const std::string& sentence, const std::string& requestId) {
-    return problemWith(500,
-                       jsonObject({{"title", "The operation failed"},
-                                   {"detail", sentence + " Nothing was changed."},
+HttpResponse failedUnchanged(const Error& failure, const std::string& requestId) {
+    const FailureKind kind = kindOf(failure.number);
+    return problemWith(kind.status,
+                       jsonObject({{"title", kind.title},
+                                   {"detail", failure.message + " Nothing was changed."},
                                    {"changed", false}}),
                        requestId);
+}
+
+HttpResponse failedUnchanged(const std::string& sentence, const std::string& requestId) {
+    return failedUnchanged(Error(ErrorNumber::none, sentence), requestId);
 }
 
 HttpResponse problemWith(int status, Json::Value members, const std::string& requestId) {

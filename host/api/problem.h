@@ -20,7 +20,9 @@ struct FieldError {
 /// A problem that no module took part in; its title is the reason phrase.
 HttpResponse problem(int status, const std::string& detail, const std::string& requestId);
 
-/// What failed before anything of a change was done: 500, which says so.
+/// What failed before anything of a change was done, and says so: the platform's failure, with the status of
+/// its kind, or another one with 500.
+HttpResponse failedUnchanged(const Error& failure, const std::string& requestId);
 HttpResponse failedUnchanged(const std::string& sentence, const std::string& requestId);
 
 /// A problem with these members; missing ones of RFC 9457 are filled in.

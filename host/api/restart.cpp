@@ -3,6 +3,7 @@
 #include "base/json_value.h"
 #include "host/api/audit.h"
 #include "host/api/changes.h"
+#include "host/api/failure_kind.h"
 #include "host/api/problem.h"
 #include "host/base/query_text.h"
 #include "host/module/platform_request.h"
@@ -59,14 +60,33 @@ Json::Value toObject(const ServiceSessions& sessions) {
     return jsonObject({{"service", sessions.service}, {"ended", sessions.ended}, {"kept", sessions.kept}});
 }
 
+Json::Value answerOf(const std::vector<ServiceSessions>& services) {
+    int ended = 0;
+    for (const ServiceSessions& each : services) {
+        ended += each.ended;
+    }
+    const auto asObject = [](const ServiceSessions& each) { return toObject(each); };
+    return jsonObject(
+        {{"dry_run", false}, {"services", jsonArray(services, asObject)}, {"sessions_ended", ended}});
+}
+
 /// "ftp: 3 sessions went on, 0 ended"
 std::string textOf(const std::vector<ServiceSessions>& services) {
     std::string text;
     for (const auto& [service, ended, kept] : services) {
+        if (ended == 0 && kept == 0) {
+            continue;
+        }
         text += (text.empty() ? "" : "; ") + service + ": " + std::to_string(kept) + " sessions went on, " +
                 std::to_string(ended) + " ended";
     }
     return text.empty() ? "there were no sessions" : text;
+}
+
+/// A daemon that does not come up leaves the former one serving.
+HttpResponse failure(const Error& error, const Call& call) {
+    const FailureKind kind = kindOf(error.number);
+    return problemWith(kind.status, jsonObject({{"title", kind.title}, {"detail", error.message}}), call.id);
 }
 
 AuditEntry entryOf(const Wish& wish, const std::vector<ServiceSessions>& services) {
@@ -78,14 +98,14 @@ AuditEntry entryOf(const Wish& wish, const std::vector<ServiceSessions>& service
 HttpResponse restartPlan(const Wish& wish, const Call& call) {
     const auto change = SettingsChange::begin();
     if (!change) {
-        return problem(500, change.error().message, call.id);
+        return failure(change.error(), call);
     }
     if (const auto staged = restartServices(wish.sessions, wish.service); !staged) {
-        return problem(500, staged.error().message, call.id);
+        return failure(staged.error(), call);
     }
     const auto plan = (*change)->plan(wish.sessions);
     if (!plan) {
-        return problem(500, plan.error().message, call.id);
+        return failure(plan.error(), call);
     }
     ChangeReport report;
     report.dryRun = true;
@@ -110,12 +130,10 @@ HttpResponse restart(HostLog& log, const Call& call) {
     const auto done = restartServices(wanted.sessions, wanted.service);
     if (!done) {
         log.write(call.id, "restart: " + done.error().message);
-        return problem(500, done.error().message, call.id);
+        return failure(done.error(), call);
     }
     writeAudit(entryOf(wanted, *done), log, call);
-    return jsonResponse(200, jsonObject({{"services", jsonArray(*done, [](const ServiceSessions& each) {
-                                              return toObject(each);
-                                          })}}));
+    return jsonResponse(200, answerOf(*done));
 }
 
 } // namespace

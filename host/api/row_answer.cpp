@@ -1,6 +1,7 @@
 #include "host/api/row_answer.h"
 
 #include "base/json_value.h"
+#include "host/api/failure_kind.h"
 #include "host/api/problem.h"
 #include "host/module/module_log.h"
 
@@ -36,33 +37,18 @@ constexpr std::array<Meaning, 5> meanings{{
 constexpr const char* oneFreePort = "a port from 1 to 65535";
 constexpr const char* freePorts = "first and last port from 1024 to 65535, such as 55536:55899";
 
-constexpr Meaning cannotBe{0, 422, "The settings cannot be like this"};
-constexpr Meaning portInUse{0, 409, "A port is taken"};
-constexpr Meaning otherFailure{0, 500, "The operation failed"};
-
-/// Of a failure for which the module has no code of its own: its kind is the platform's to tell.
-Meaning meaningOf(ErrorNumber error) {
-    switch (error) {
-    case ErrorNumber::invalid:
-    case ErrorNumber::notFound:
-        return cannotBe;
-    case ErrorNumber::portTaken:
-        return portInUse;
-    default:
-        return otherFailure;
-    }
-}
-
 bool isOnePort(std::string_view field) {
     return field == "portnum";
 }
 
 Meaning meaningOf(const Outcome& outcome) {
     const auto* const found = std::ranges::find(meanings, outcome.code, &Meaning::code);
-    if (found == meanings.end()) {
-        return meaningOf(outcome.platform.error);
+    if (found == meanings.end()) { // a failure for which the module has no code of its own
+        const FailureKind kind = kindOf(outcome.platform.error);
+        return {outcome.code, kind.status, kind.title};
     }
     // A port that nobody holds is none.
+    const FailureKind cannotBe = kindOf(ErrorNumber::invalid);
     return found->portTaken && outcome.platform.conflict.holder.empty()
                ? Meaning{outcome.code, cannotBe.status, cannotBe.title, found->field,
                          isOnePort(found->field) ? oneFreePort : freePorts}
@@ -88,7 +74,7 @@ std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& mean
     std::string detail;
     if (meaning.portTaken) { // the module only says that there is a conflict
         append(detail, outcome.platform.conflict.sentence);
-    } else if (*meaning.field != '\0' && meaning.status == cannotBe.status) {
+    } else if (*meaning.field != '\0' && meaning.status == kindOf(ErrorNumber::invalid).status) {
         append(detail, describe({meaning.field, meaning.expected}));
     } else {
         const std::string reason = reasonIn(outcome.logLines);

@@ -10,6 +10,7 @@
 
 #include <syslog.h>
 
+#include <algorithm>
 #include <utility>
 
 namespace velt {
@@ -53,6 +54,19 @@ Result<> renewIfOn(const Daemon& daemon) {
                               : Result<>();
 }
 
+/// Those that are on have been restarted, whether or not they had sessions.
+std::vector<ServiceSessions> withIdleOnes(std::vector<ServiceSessions> counted, std::string_view service) {
+    for (const Daemon* daemon : allDaemons()) {
+        const bool wanted = service.empty() || service == daemon->apiName;
+        const auto settings = daemon->settings();
+        if (wanted && settings && settings->enabled() &&
+            std::ranges::count(counted, daemon->apiName, &ServiceSessions::service) == 0) {
+            counted.push_back({std::string(daemon->apiName), 0, 0});
+        }
+    }
+    return counted;
+}
+
 std::vector<DaemonFailure> followAll() {
     followWithFirewall(); // its rules went with the boot as well
     const auto daemons = allDaemons();
@@ -89,7 +103,9 @@ Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::
     ServiceRequest request(policy);
     const auto done = forEachDaemon(renewIfOn, service);
     auto sessions = request.finish();
-    return done ? std::move(sessions) : done.error();
+    VELT_RETURN_IF_ERROR(done);
+    VELT_ASSIGN_OR_RETURN(auto counted, std::move(sessions));
+    return withIdleOnes(std::move(counted), service);
 }
 
 } // namespace velt

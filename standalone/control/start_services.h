@@ -26,8 +26,8 @@ Result<> stopServices();
 /// Has the daemon ("ftp" or "sftp"; all for "") give way to a new one, with the configuration, certificate,
 /// host keys and programs of now, and starts one that is on and does not run. FTP accepts connections all the
 /// time, SFTP but for some milliseconds. A daemon that does not come up leaves the former one serving. Tells
-/// what became of the sessions; failures are treated in the same way. Within a ServiceRequest, that one's
-/// policy counts.
+/// what became of the sessions of each service that is on; failures are treated in the same way. Within a
+/// ServiceRequest, that one's policy counts.
 Result<std::vector<ServiceSessions>> restartServices(SessionPolicy policy, std::string_view service = {});
 
 } // namespace velt

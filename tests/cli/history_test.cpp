@@ -74,6 +74,19 @@ TEST_F(HistoryTest, TheOneThatWaitsIsConfirmed) {
     EXPECT_NE(run({"confirm"}).err.find("There is no change to confirm."), std::string::npos);
 }
 
+TEST_F(HistoryTest, OfSeveralThatWaitOneHasToBeNamed) {
+    answer("GET /api/history?limit=100",
+           R"({"changes": [{"id": 14, "state": "waiting"}, {"id": 13, "state": "done"},
+               {"id": 12, "state": "waiting"}], "next": null})");
+    const RunResult result = run({"confirm"});
+    EXPECT_EQ(result.code, 3);
+    EXPECT_NE(result.err.find("Several changes wait for their confirmation: 14, 12."), std::string::npos)
+        << result.err;
+    EXPECT_NE(result.err.find("veltctl confirm 14"), std::string::npos) << result.err;
+    host.answerWith("POST /api/history/12/confirm", HttpReply{204, "", "", false, false});
+    EXPECT_EQ(run({"confirm", "12"}).out, "Change 12 stays.\n");
+}
+
 TEST_F(HistoryTest, TwoStatesAreCompared) {
     answer("POST /api/diff", R"({"changes": [{"field": "/ftp/timeout", "from": 300, "to": 600}]})");
     const RunResult result = run({"diff", "11", "12"});
@@ -106,8 +119,10 @@ TEST_F(RestartTest, SaysWhatBecameOfTheSessions) {
     EXPECT_EQ(run({"restart", "ftp"}).out, "ftp: restarted, 3 sessions go on, 0 ended\n"
                                            "The services that are on run with what is stored now.\n");
     host.answerWith("POST /api/restart?sessions=end",
-                    HttpReply{200, R"({"services": []})", "application/json", false, false});
-    EXPECT_EQ(run({"restart", "--end-sessions"}).code, 0);
+                    HttpReply{200, R"({"services": [{"service": "sftp", "ended": 0, "kept": 0}]})",
+                              "application/json", false, false});
+    EXPECT_EQ(run({"restart", "--end-sessions"}).out,
+              "sftp: restarted\nThe services that are on run with what is stored now.\n");
     EXPECT_EQ(run({"restart", "ftps"}).code, 2);
     host.answerWith("POST /api/restart?sessions=keep&dry_run=true",
                     HttpReply{200,

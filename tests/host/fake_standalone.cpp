@@ -86,6 +86,10 @@ public:
     }
 
     velt::Result<velt::ChangeOutcome> plan(velt::SessionPolicy policy) override {
+        const FakeStandalone& fake = FakeStandalone::instance();
+        if (fake.planFails) {
+            return velt::Error(fake.commitError, fake.sentence);
+        }
         return velt::ChangeOutcome{steps(), std::nullopt, true, ended(policy)};
     }
 

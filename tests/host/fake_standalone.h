@@ -19,6 +19,7 @@ struct FakeStandalone {
     std::string sentence;                              ///< of the last error of the requests to come
     velt::PortConflict conflict;                       ///< that is found
     velt::ErrorNumber error = velt::ErrorNumber::none; ///< the kind of the last error
+    bool planFails = false;                            ///< with commitError, as commits do
     bool commitFails = false;                          ///< of the next changes, with `sentence`
     velt::ErrorNumber commitError = velt::ErrorNumber::daemon;
     bool undone = true;                      ///< what was done of a change that failed

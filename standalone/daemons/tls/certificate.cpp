@@ -53,7 +53,7 @@ bool isOpen(const struct stat& facts) {
 
 Error refuse(const std::filesystem::path& file, const std::string& why) {
     ERR_clear_error();
-    return {ErrorNumber::invalid, file.string() + " " + why + "."};
+    return {ErrorNumber::certificate, file.string() + " " + why + "."};
 }
 
 Result<ServerCertificate> load(const Pair& pair) {

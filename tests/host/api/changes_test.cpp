@@ -43,14 +43,19 @@ TEST_F(HostChanges, AChangeThatCannotBeDoneIsTakenBack) {
     access.sentence = "The SFTP daemon does not start: bad luck.";
     const Answer answer = post(sftp + "set", R"({"enable":true,"portnum":2222})");
     EXPECT_EQ(answer.status, 500);
-    EXPECT_EQ(answer.json()["title"], "The change was taken back");
+    EXPECT_EQ(answer.json()["title"], "The operation failed");
     EXPECT_EQ(answer.json()["detail"], "The SFTP daemon does not start: bad luck. All is as it was before.");
     EXPECT_EQ(answer.json()["changed"], false);
     EXPECT_TRUE(access.history.empty());
     EXPECT_NE(get("/metrics").body.find(R"(outcome="taken_back")"), std::string::npos);
     platform.reset();
     access.commitError = velt::ErrorNumber::portTaken;
-    EXPECT_EQ(post(sftp + "set", R"({"enable":true,"portnum":2222})").status, 409);
+    const Answer taken = post(sftp + "set", R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(taken.status, 409);
+    access.planFails = true;
+    const Answer plan = post(sftp + "set?dry_run=true", R"({"enable":true,"portnum":2222})");
+    EXPECT_EQ(plan.status, 409);
+    EXPECT_EQ(plan.json()["title"], taken.json()["title"]);
     platform.reset();
     access.undone = false;
     const Answer half = post(sftp + "set", R"({"enable":true,"portnum":2222})");
@@ -86,6 +91,7 @@ TEST_F(HostChanges, WhatThePlatformRefusesIsTheCallersToMend) {
     EXPECT_EQ(statusFor(velt::ErrorNumber::invalid), 422);
     EXPECT_EQ(statusFor(velt::ErrorNumber::notFound), 422);
     EXPECT_EQ(statusFor(velt::ErrorNumber::portTaken), 409);
+    EXPECT_EQ(statusFor(velt::ErrorNumber::certificate), 409);
     EXPECT_EQ(statusFor(velt::ErrorNumber::store), 500);
     EXPECT_EQ(statusFor(velt::ErrorNumber::daemon), 500);
 }

@@ -21,7 +21,8 @@ TEST_F(HostRestart, TellsWhatBecameOfTheSessions) {
     access.sessions = {{"ftp", 1, 2}};
     const Answer answer = post("/api/restart?service=ftp&sessions=end");
     EXPECT_EQ(answer.status, 200);
-    EXPECT_EQ(answer.body, R"({"services":[{"ended":1,"kept":2,"service":"ftp"}]})");
+    EXPECT_EQ(answer.body,
+              R"({"dry_run":false,"services":[{"ended":1,"kept":2,"service":"ftp"}],"sessions_ended":1})");
     EXPECT_EQ(post("/api/restart").status, 200);
     EXPECT_EQ(access.askedRestarts, (std::vector<std::string>{"ftp end", " keep"}));
 }
@@ -29,7 +30,7 @@ TEST_F(HostRestart, TellsWhatBecameOfTheSessions) {
 TEST_F(HostRestart, IsWrittenDown) {
     access.sessions = {{"ftp", 1, 2}};
     ASSERT_EQ(post("/api/restart?service=ftp&sessions=end").status, 200);
-    access.sessions = {};
+    access.sessions = {{"ftp", 0, 0}, {"sftp", 0, 0}};
     ASSERT_EQ(post("/api/restart").status, 200);
     EXPECT_EQ(access.audit, (std::vector<std::string>{"ftp: ftp: 2 sessions went on, 1 ended",
                                                       "all services: there were no sessions"}));

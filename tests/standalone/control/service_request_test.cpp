@@ -252,7 +252,7 @@ TEST_F(ServiceRequestTest, ARestartReplacesDaemonsWhateverTheyRunWith) {
 
 TEST_F(ServiceRequestTest, ARestartStartsWhatIsOnAlone) {
     ASSERT_EQ(VLIBServicectlStop("ftpd", 0), 0) << lastErrorSentence();
-    EXPECT_EQ(restart(), Sessions());
+    EXPECT_EQ(restart(), (Sessions{{"ftp", 0, 0}}));
     EXPECT_TRUE(accepts(ftpPort_));
     EXPECT_FALSE(accepts(sftpPort_));
 }
