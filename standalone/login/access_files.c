@@ -4,7 +4,6 @@
 #include <fcntl.h>
 #include <limits.h>
 #include <stdio.h>
-#include <string.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -15,49 +14,66 @@ enum {
 static const char folder_name[] = "/etc/velt";
 static const char* const file_names[file_count] = {"shares.json", "chroot_rules"};
 
-/* What tells one content of a file from another: a file that is written anew is another one or has other
- * times. All zero when there is none. */
+/* What tells whether the file is still the same, and still there: its times change with its content, and with
+ * its name. */
 struct version {
-    dev_t device;
-    ino_t number;
+    nlink_t names;
     off_t size;
     struct timespec written;
     struct timespec changed;
 };
 
+struct noted {
+    int file; /* -1: there was none */
+    struct version version;
+};
+
 static int folder = -1;
-static struct version noted[file_count];
+static struct noted noted[file_count] = {{-1, {0, 0, {0, 0}, {0, 0}}}, {-1, {0, 0, {0, 0}, {0, 0}}}};
+
+static void forget(int* file) {
+    if (*file >= 0) {
+        (void)close(*file);
+    }
+    *file = -1;
+}
 
 static int is_same_time(struct timespec one, struct timespec other) {
     return one.tv_sec == other.tv_sec && one.tv_nsec == other.tv_nsec;
 }
 
 static int is_same(const struct version* one, const struct version* other) {
-    return one->device == other->device && one->number == other->number && one->size == other->size &&
+    return one->names == other->names && one->size == other->size &&
            is_same_time(one->written, other->written) && is_same_time(one->changed, other->changed);
 }
 
-static int look(const char* name, struct version* found) {
+static int look(int file, struct version* found) {
     struct stat status;
 
-    memset(found, 0, sizeof(*found));
-    if (fstatat(folder, name, &status, AT_SYMLINK_NOFOLLOW) < 0) {
-        return errno == ENOENT ? 0 : -1;
+    if (fstat(file, &status) < 0) {
+        return -1;
     }
-    found->device = status.st_dev;
-    found->number = status.st_ino;
+    found->names = status.st_nlink;
     found->size = status.st_size;
     found->written = status.st_mtim;
     found->changed = status.st_ctim;
     return 0;
 }
 
+static int note(const char* name, struct noted* one) {
+    one->file = openat(folder, name, O_PATH | O_NOFOLLOW | O_CLOEXEC);
+    if (one->file < 0) {
+        return errno == ENOENT ? 0 : -1;
+    }
+    return look(one->file, &one->version);
+}
+
 int velt_note_access_files(const char* state_root) {
     char path[PATH_MAX];
 
-    if (folder >= 0) {
-        (void)close(folder);
-        folder = -1;
+    forget(&folder);
+    for (int i = 0; i < file_count; i++) {
+        forget(&noted[i].file);
     }
     if (snprintf(path, sizeof(path), "%s%s", state_root, folder_name) >= (int)sizeof(path)) {
         errno = ENAMETOOLONG;
@@ -68,18 +84,26 @@ int velt_note_access_files(const char* state_root) {
         return -1;
     }
     for (int i = 0; i < file_count; i++) {
-        if (look(file_names[i], &noted[i]) < 0) {
+        if (note(file_names[i], &noted[i]) < 0) {
             return -1;
         }
     }
     return 0;
 }
 
-int velt_access_files_changed(void) {
+static int is_unchanged(const char* name, const struct noted* one) {
     struct version now;
+    struct stat status;
 
+    if (one->file < 0) {
+        return fstatat(folder, name, &status, AT_SYMLINK_NOFOLLOW) < 0 && errno == ENOENT;
+    }
+    return look(one->file, &now) == 0 && is_same(&now, &one->version);
+}
+
+int velt_access_files_changed(void) {
     for (int i = 0; i < file_count; i++) {
-        if (look(file_names[i], &now) < 0 || !is_same(&now, &noted[i])) {
+        if (!is_unchanged(file_names[i], &noted[i])) {
             return 1;
         }
     }

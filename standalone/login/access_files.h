@@ -9,8 +9,8 @@
 int velt_note_access_files(const char* state_root);
 
 /* Whether they are others than those that were noted: written, replaced, made or removed since, or impossible
- * to look at. Works after the change of the root directory too, with root's rights or where everybody may
- * search their folder. */
+ * to look at. Works in any root directory and without rights to the files; but to see that there is still no
+ * file, this process must be allowed to search the folder. */
 int velt_access_files_changed(void);
 
 #endif

@@ -1,7 +1,5 @@
 #include "standalone/login/file_functions.h"
 
-#include "privs.h"
-
 #include "standalone/login/access_files.h"
 #include "standalone/login/place.h"
 
@@ -22,12 +20,7 @@ static void end_session(void) {
 /* For names that are made, moved or removed. A session that is older than a share knows nothing of the
  * folders on the way to it, and one of them, once moved, would show to later logins what they may not see. */
 static int open_to_rename(struct velt_place* place, const char* path) {
-    int changed = FALSE;
-
-    PRIVS_ROOT
-    changed = velt_access_files_changed();
-    PRIVS_RELINQUISH
-    if (changed) {
+    if (velt_access_files_changed()) {
         end_session();
         errno = EACCES;
         return -1;
