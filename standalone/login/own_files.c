@@ -1,5 +1,7 @@
 #include "standalone/login/own_files.h"
 
+#include "standalone/login/way.h"
+
 #include <errno.h>
 #include <fcntl.h>
 #include <limits.h>
@@ -12,7 +14,6 @@
 
 enum {
     most_homes = 2,
-    most_links = 40,
     folder_flags = O_PATH | O_DIRECTORY | O_CLOEXEC
 };
 
@@ -77,13 +78,19 @@ struct identity {
     ino_t number;
 };
 
-/* What stood at a kept place, or on the way to one, at the login. */
+/* What stands at a kept place, or on the way to one. */
 struct kept {
     struct identity object;
     int whole; /* else its name alone is kept, since other places depend on it */
 };
 
-static struct identity homes[most_homes];
+struct home {
+    char path[PATH_MAX];
+    struct velt_way_end end; /* when its files were last kept */
+    int is_known;            /* else they could not be */
+};
+
+static struct home homes[most_homes];
 static size_t home_count;
 static struct kept* kept;
 static size_t kept_count;
@@ -110,6 +117,17 @@ static int keep(const struct stat* object, int whole) {
     return 0;
 }
 
+static int keep_name(const struct stat* object, int is_end) {
+    (void)is_end;
+    return keep(object, 0);
+}
+
+static void forget_kept(void) {
+    free(kept);
+    kept = NULL;
+    kept_count = 0;
+}
+
 static int is_kept(const struct stat* object, int whole_only) {
     for (size_t i = 0; i < kept_count; i++) {
         if (is(kept[i].object, object) && (kept[i].whole || !whole_only)) {
@@ -126,89 +144,6 @@ static void leave(int folder) {
     errno = reason;
 }
 
-static int exchange(int* folder, int next) {
-    leave(*folder);
-    *folder = next;
-    return next < 0 ? -1 : 0;
-}
-
-/* A way to be walked: folder by folder, with what is left of the path. */
-struct way {
-    int folder;
-    int links;
-    char rest[PATH_MAX];
-};
-
-static int follow(struct way* way, const char* name, const char* rest) {
-    char target[PATH_MAX];
-    char joined[PATH_MAX];
-
-    ssize_t length = readlinkat(way->folder, name, target, sizeof(target) - 1);
-    if (length < 0) {
-        return -1;
-    }
-    target[length] = '\0';
-    int size = snprintf(joined, sizeof(joined), "%s/%s", target, rest);
-    if (size >= (int)sizeof(joined) || ++way->links > most_links) {
-        errno = ELOOP;
-        return -1;
-    }
-    memcpy(way->rest, joined, (size_t)size + 1);
-    return target[0] == '/' ? exchange(&way->folder, open("/", folder_flags)) : 0;
-}
-
-/* Keeps what stands at the first name of the way, and goes on there. `end` becomes what stands at the end of
- * the way. 1 while there is more of it, else 0, or -1 with errno. */
-static int walk_step(struct way* way, int whole, struct stat* end) {
-    char name[NAME_MAX + 1];
-
-    const char* start = way->rest + strspn(way->rest, "/");
-    size_t length = strcspn(start, "/");
-    if (length == 0) {
-        return 0;
-    }
-    if (length > NAME_MAX) {
-        errno = ENAMETOOLONG;
-        return -1;
-    }
-    (void)snprintf(name, sizeof(name), "%.*s", (int)length, start);
-    const char* rest = start + length + strspn(start + length, "/");
-    if (fstatat(way->folder, name, end, AT_SYMLINK_NOFOLLOW) < 0 || keep(end, whole && *rest == '\0') < 0) {
-        return -1;
-    }
-    if (S_ISLNK(end->st_mode)) {
-        return follow(way, name, rest) < 0 ? -1 : 1;
-    }
-    if (*rest == '\0') {
-        return 0;
-    }
-    memmove(way->rest, rest, strlen(rest) + 1);
-    return exchange(&way->folder, openat(way->folder, name, folder_flags)) < 0 ? -1 : 1;
-}
-
-/* Keeps the folders and links on the way to folder/name, and what stands at its end. 1 when something does,
- * 0 when nothing does, -1 with errno. */
-static int keep_way(const char* folder, const char* name, int whole, struct stat* end) {
-    struct way way = {-1, 0, ""};
-    int more = 1;
-
-    if (snprintf(way.rest, sizeof(way.rest), "%s/%s", folder, name) >= (int)sizeof(way.rest)) {
-        errno = ENAMETOOLONG;
-        return -1;
-    }
-    way.folder = open("/", folder_flags);
-    if (way.folder < 0 || fstat(way.folder, end) < 0) {
-        more = -1;
-    }
-    while (more > 0) {
-        more = walk_step(&way, whole, end);
-    }
-    if (way.folder >= 0) {
-        leave(way.folder);
-    }
-    return more == 0 ? 1 : errno == ENOENT || errno == ENOTDIR ? 0 : -1;
-}
-
 /* Whether it is how things are, and not a failure of the moment. */
 static int is_out_of_reach(int error) {
     return error == EACCES || error == EPERM || error == ELOOP || error == ENAMETOOLONG;
@@ -220,34 +155,80 @@ static const char* stem_of(const char* name, char* stem, size_t size) {
     return stem;
 }
 
-int velt_keep_home(const char* home) {
+static int keep_files(struct home* home) {
     char stem[NAME_MAX + 1];
-    struct stat status;
+    struct velt_way_end end;
 
-    int exists = keep_way(home, "", 0, &status);
-    if (exists <= 0) {
-        return exists;
+    if (velt_walk_way(home->path, "", keep_name, &home->end) < 0) {
+        return -1;
     }
+    for (const char* const* name = own_names; home->end.exists && *name != NULL; name++) {
+        /* What cannot be reached is recognised by its name alone. Any other failure
+         * may be over in a moment, and what it hid could be changed then. */
+        if (velt_walk_way(home->path, stem_of(*name, stem, sizeof(stem)), keep, &end) < 0 &&
+            !is_out_of_reach(errno)) {
+            return -1;
+        }
+    }
+    home->is_known = 1;
+    return 0;
+}
+
+int velt_keep_home(const char* path) {
+    struct home* home = &homes[home_count];
+
     if (home_count == most_homes) {
         errno = ENOSPC;
         return -1;
     }
-    homes[home_count++] = identity_of(&status);
-    for (const char* const* name = own_names; *name != NULL; name++) {
-        /* What cannot be reached with root's rights either is recognised by its name alone. Any other failure
-         * may be over in a moment, and what it hid could be changed then. */
-        if (keep_way(home, stem_of(*name, stem, sizeof(stem)), 1, &status) < 0 && !is_out_of_reach(errno)) {
+    if (snprintf(home->path, sizeof(home->path), "%s", path) >= (int)sizeof(home->path)) {
+        errno = ENAMETOOLONG;
+        return -1;
+    }
+    home->is_known = 0;
+    home_count++;
+    return velt_begin_ways() < 0 ? -1 : keep_files(home);
+}
+
+void velt_forget_homes(void) {
+    forget_kept();
+    home_count = 0;
+}
+
+static int is_same_end(const struct velt_way_end* one, const struct velt_way_end* other) {
+    if (one->exists || other->exists) {
+        return one->exists && other->exists && is(identity_of(&one->what), &other->what);
+    }
+    return is(identity_of(&one->folder), &other->folder) && strcmp(one->name, other->name) == 0;
+}
+
+int velt_look_at_homes(void) {
+    struct velt_way_end now;
+    int changed = 0;
+
+    for (size_t i = 0; i < home_count && !changed; i++) {
+        if (!homes[i].is_known) {
+            changed = 1;
+        } else if (velt_walk_way(homes[i].path, "", NULL, &now) == 0) {
+            changed = !is_same_end(&now, &homes[i].end);
+        } else if (errno != EACCES) {
+            return -1;
+        }
+        /* Where the user may not look, those who read such files with the user's rights find none. */
+    }
+    if (!changed) {
+        return 0;
+    }
+    forget_kept();
+    for (size_t i = 0; i < home_count; i++) {
+        homes[i].is_known = 0;
+    }
+    for (size_t i = 0; i < home_count; i++) {
+        if (keep_files(&homes[i]) < 0) {
             return -1;
         }
     }
     return 0;
-}
-
-void velt_forget_homes(void) {
-    free(kept);
-    kept = NULL;
-    kept_count = 0;
-    home_count = 0;
 }
 
 void velt_keep_root(void) {
@@ -290,7 +271,12 @@ static int keeps(int folder, const struct stat* here, int at_root, const char* n
     size_t count = 0;
 
     for (size_t i = 0; i < home_count; i++) {
-        if (is(homes[i], here)) {
+        const struct velt_way_end* end = &homes[i].end;
+        if (!end->exists && name != NULL && is(identity_of(&end->folder), here) &&
+            strcasecmp(end->name, name) == 0) {
+            return 1;
+        }
+        if (end->exists && is(identity_of(&end->what), here)) {
             tables[count++] = own_names;
         }
     }
@@ -323,7 +309,8 @@ static int is_within_kept(int folder, const char* name) {
         if (result == 0) {
             result = keeps(folder, &here, at_root, name, &child);
         }
-        (void)exchange(&folder, up);
+        leave(folder);
+        folder = up;
         if (at_root) {
             break;
         }

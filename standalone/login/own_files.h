@@ -3,9 +3,14 @@
 #ifndef VELT_STANDALONE_LOGIN_OWN_FILES_H
 #define VELT_STANDALONE_LOGIN_OWN_FILES_H
 
-/* Keeps such files of this home, and the home itself, as they are. Called before the root directory changes,
- * with the right to look everywhere. A home that does not exist is none. 0, or -1 with errno. */
-int velt_keep_home(const char* home);
+/* Keeps such files of this home, and the home itself, as they are; where the home does not exist, it is not
+ * made either. Called before the root directory changes, with the right to look everywhere. 0, or -1 with
+ * errno. */
+int velt_keep_home(const char* path);
+
+/* Keeps the files of what stands at the homes' paths by now: a home may have been made or exchanged since.
+ * Needs no more rights than the user has. 0, or -1 with errno; then nothing may be changed. */
+int velt_look_at_homes(void);
 
 /* Forgets the homes of an earlier login. */
 void velt_forget_homes(void);

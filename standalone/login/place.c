@@ -51,6 +51,9 @@ static int take_target(struct velt_place* place) {
 int velt_open_place(struct velt_place* place, const char* path, enum velt_change change) {
     int more = 1;
 
+    if (velt_look_at_homes() < 0) {
+        return -1;
+    }
     if (snprintf(place->path, sizeof(place->path), "%s", path) >= (int)sizeof(place->path)) {
         errno = ENAMETOOLONG;
         return -1;

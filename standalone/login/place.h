@@ -13,7 +13,8 @@ struct velt_place {
     char path[PATH_MAX];
 };
 
-/* Opens the place for this change. 0, or -1 with errno: EACCES where own_files.h forbids the change. */
+/* Opens the place for this change. 0, or -1 with errno: EACCES where own_files.h forbids the change, of the
+ * homes as they are now. */
 int velt_open_place(struct velt_place* place, const char* path, enum velt_change change);
 
 /* Leaves errno alone. */

@@ -189,6 +189,62 @@ TEST_F(OwnFiles, areKeptWhereAShareHoldsTheHome) {
     }
 }
 
+TEST_F(OwnFiles, areNotMadeInAHomeThatWasMissingAtTheLogin) {
+    share("homes", {{"alice", Access::write}}, {}, "/mnt/home");
+    record.user_chroot = 0;
+    fs::rename(home, "/mnt/away");
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    ASSERT_EQ(session.command("MKD /homes/prepared").code, 257);
+    ASSERT_EQ(session.command("MKD /homes/prepared/.ssh").code, 257) << "no home";
+    ASSERT_EQ(session.send("STOR /homes/prepared/.ssh/authorized_keys", "key"), 226);
+    EXPECT_EQ(move(session, "/homes/prepared", "/homes/alice"), 550);
+    EXPECT_EQ(session.command("MKD /homes/alice").code, 550);
+    EXPECT_FALSE(fs::exists(home));
+    makeFolder(home);
+    EXPECT_EQ(session.command("MKD /homes/alice/.ssh").code, 550);
+    EXPECT_EQ(move(session, "/homes/prepared/.ssh", "/homes/alice/.ssh"), 550);
+    EXPECT_EQ(move(session, "/homes/prepared", "/homes/alice"), 550);
+    EXPECT_EQ(session.send("STOR /homes/alice/.profile", "x"), 550);
+    EXPECT_EQ(session.send("STOR /homes/alice/new", "x"), 226);
+    EXPECT_EQ(names(), "new ");
+    fs::remove_all("/mnt/away");
+}
+
+TEST_F(OwnFiles, areNotMadeInAHomeThatIsExchanged) {
+    share("homes", {{"alice", Access::write}}, {}, "/mnt/home");
+    record.user_chroot = 0;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    EXPECT_EQ(session.command("MKD /homes/alice/.ssh").code, 550);
+    fs::rename(home, "/mnt/home/former");
+    makeFolder(home);
+    EXPECT_EQ(session.command("MKD /homes/alice/.ssh").code, 550);
+    ASSERT_EQ(session.command("CWD /homes/alice").code, 250);
+    EXPECT_EQ(session.command("MKD .ssh").code, 550);
+    EXPECT_EQ(session.send("STOR .bashrc", "x"), 550);
+    EXPECT_EQ(move(session, "/homes/alice", "/homes/away"), 550);
+    EXPECT_EQ(names(), "");
+    EXPECT_EQ(session.send("STOR new", "x"), 226);
+}
+
+TEST_F(OwnFiles, areKnownWhereTheUserCannotLook) {
+    share("rw", {{"alice", Access::write}});
+    share("homes", {{"alice", Access::write}}, {}, home);
+    record.user_chroot = 0;
+    start();
+    FtpSession session(port);
+    ASSERT_EQ(session.logIn("alice"), 230);
+    fs::permissions("/mnt/home", fs::perms(0700));
+    fs::permissions(worldRoot / "etc/velt", fs::perms(0700));
+    EXPECT_EQ(session.send("STOR /rw/new", "x"), 226);
+    EXPECT_EQ(session.command("MKD /rw/made").code, 257);
+    EXPECT_EQ(session.command("MKD /homes/.ssh").code, 550);
+    fs::permissions("/mnt/home", fs::perms(0755));
+}
+
 TEST_F(OwnFiles, areThoseOfTheHomeOnly) {
     const auto outer = share("outer", {{"alice", Access::write}});
     makeFolder(home / ".ssh");

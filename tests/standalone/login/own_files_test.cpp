@@ -100,9 +100,71 @@ TEST_F(OwnFiles, areNoneWithoutAHome) {
     EXPECT_EQ(velt_keep_home((folder_.path() / "absent").c_str()), 0);
     EXPECT_EQ(velt_keep_home((folder_.write("file", "") / "below").c_str()), 0);
     EXPECT_EQ(refusal(folder_.path() / ".profile", velt_changes_name), "");
+    velt_forget_homes();
     fs::create_directory_symlink("turn", folder_.path() / "turn");
     EXPECT_EQ(velt_keep_home((folder_.path() / "turn").c_str()), -1);
+    velt_forget_homes();
     EXPECT_EQ(velt_keep_home(std::string(PATH_MAX, 'x').c_str()), -1);
+}
+
+TEST_F(OwnFiles, needAHomeThatASessionDoesNotMake) {
+    ASSERT_EQ(velt_keep_home((folder_.path() / "homes/alice").c_str()), 0);
+    for (const char* missing : {"homes", "HOMES"}) {
+        EXPECT_EQ(refusal(folder_.path() / missing, velt_changes_name), "kept") << missing;
+        EXPECT_EQ(refusal(folder_.path() / missing, velt_changes_content), "kept") << missing;
+    }
+    EXPECT_EQ(refusal(folder_.path() / "other", velt_changes_name), "");
+    fs::create_directory(folder_.path() / "homes");
+    EXPECT_EQ(refusal(folder_.path() / "homes", velt_changes_name), "kept") << "on the way to the home";
+    EXPECT_EQ(refusal(folder_.path() / "homes/alice", velt_changes_name), "kept");
+    EXPECT_EQ(refusal(folder_.path() / "homes/bob", velt_changes_name), "");
+    EXPECT_EQ(refusal(folder_.path() / "alice", velt_changes_name), "");
+    fs::create_directory(folder_.path() / "homes/alice");
+    EXPECT_EQ(refusal(folder_.path() / "homes/alice", velt_changes_name), "kept");
+    EXPECT_EQ(refusal(folder_.path() / "homes/alice/.ssh", velt_changes_name), "kept");
+    EXPECT_EQ(refusal(folder_.path() / "homes/alice/free", velt_changes_name), "");
+}
+
+TEST_F(OwnFiles, needAHomeBehindALinkThatLeadsNowhere) {
+    fs::create_directory_symlink("elsewhere/alice", folder_.path() / "home");
+    ASSERT_EQ(velt_keep_home(home().c_str()), 0);
+    EXPECT_EQ(refusal(home(), velt_changes_name), "kept");
+    EXPECT_EQ(refusal(folder_.path() / "elsewhere", velt_changes_name), "kept");
+    fs::create_directory(folder_.path() / "elsewhere");
+    EXPECT_EQ(refusal(folder_.path() / "elsewhere/alice", velt_changes_name), "kept");
+    EXPECT_EQ(refusal(folder_.path() / "elsewhere/bob", velt_changes_name), "");
+}
+
+TEST_F(OwnFiles, needAHomeInPlaceOfAFile) {
+    ASSERT_EQ(velt_keep_home((folder_.write("file", "") / "below").c_str()), 0);
+    EXPECT_EQ(refusal(folder_.path() / "file", velt_changes_name), "kept");
+}
+
+TEST_F(OwnFiles, areThoseOfTheHomeThatStandsThereNow) {
+    fs::create_directories(home() / "dots");
+    keep();
+    fs::rename(home(), folder_.path() / "former");
+    EXPECT_EQ(name("."), std::to_string(ENOENT));
+    EXPECT_EQ(refusal(home(), velt_changes_name), "kept") << "it is not made anew";
+    fs::create_directories(home() / "keys");
+    fs::create_directory_symlink("keys", home() / ".ssh");
+    for (const char* kept : {".ssh/authorized_keys", "keys/authorized_keys", ".profile", ".Bashrc"}) {
+        EXPECT_EQ(content(kept), "kept") << kept;
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    EXPECT_EQ(name("."), "kept");
+    EXPECT_EQ(content("free"), "");
+    EXPECT_EQ(refusal(folder_.path() / "former/.profile", velt_changes_name), "") << "no home any more";
+    EXPECT_EQ(refusal(folder_.path() / "former", velt_changes_name), "");
+}
+
+TEST_F(OwnFiles, cannotBeToldWhereTheHomeCannotBeFound) {
+    keep();
+    fs::remove(home());
+    fs::create_directory_symlink("home", home());
+    EXPECT_EQ(refusal(folder_.path() / "free", velt_changes_name), std::to_string(ELOOP));
+    fs::remove(home());
+    EXPECT_EQ(refusal(folder_.path() / "free", velt_changes_name), "");
 }
 
 TEST_F(OwnFiles, areForgottenWithTheLogin) {

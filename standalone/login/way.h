@@ -1,0 +1,27 @@
+/* Where a path of the server leads, also asked from a session whose root directory is another one. */
+#ifndef VELT_STANDALONE_LOGIN_WAY_H
+#define VELT_STANDALONE_LOGIN_WAY_H
+
+#include <limits.h>
+#include <sys/stat.h>
+
+struct velt_way_end {
+    int exists;
+    struct stat what;        /* where it exists */
+    struct stat folder;      /* else the last folder on the way, */
+    char name[NAME_MAX + 1]; /* and the name there at which no folder stands */
+};
+
+/* Told of each folder, file and link on the way; `is_end` at the last name, of a link's target too. 0, or -1
+ * with errno, which ends the walk. */
+typedef int (*velt_visit)(const struct stat* object, int is_end);
+
+/* Begins all ways from now on at this process's root directory, whatever that becomes. 0, or -1 with errno.
+ */
+int velt_begin_ways(void);
+
+/* Walks `path` and then `below`, which is "" or a name. `visit` may be NULL. 0 also where nothing stands at
+ * the end, or -1 with errno. */
+int velt_walk_way(const char* path, const char* below, velt_visit visit, struct velt_way_end* end);
+
+#endif
