@@ -17,6 +17,7 @@ using Steps = std::vector<std::string>;
 
 constexpr std::size_t headLimit = 2048;
 constexpr std::size_t bodyLimit = 4096;
+constexpr std::size_t room = 8192; ///< of the reader, at most
 
 std::string describe(const HttpRequest& request) {
     return request.method + '\n' + request.target + '\n' + request.host + '\n' + request.origin + '\n' +
@@ -53,9 +54,9 @@ Steps read(const std::string& bytes, std::size_t piece) {
     Steps steps;
     std::size_t at = 0;
     while (takeSteps(reader, steps) && at < bytes.size()) {
-        const auto [place, room] = reader.space();
-        velt::fuzz::check(room > 0, "there is room for more");
-        const std::size_t size = std::min({room, piece, bytes.size() - at});
+        const auto [place, space] = reader.space();
+        velt::fuzz::check(space > 0, "there is room for more");
+        const std::size_t size = std::min({space, piece, bytes.size() - at});
         std::memcpy(place, bytes.data() + at, size);
         reader.added(size);
         at += size;
@@ -75,12 +76,27 @@ void checkSame(const Steps& pieces, const Steps& whole, const char* promise) {
     velt::fuzz::check(pieces == whole, promise);
 }
 
+bool isWithoutRefusal(const Steps& steps, const Steps& others) {
+    return steps.size() + 1 == others.size() && others.back() == "refused";
+}
+
 /// Between two chunks the reader waits for the fewest bytes that could come, and so may see a fault later in
 /// pieces than in one go: but no later than with these bytes more.
 Steps readPieces(const std::string& bytes, std::size_t piece, const Steps& whole) {
     Steps steps = read(bytes, piece);
-    const bool refusedLater = steps.size() + 1 == whole.size() && whole.back() == "refused";
-    return refusedLater ? read(bytes + "xxxxx", piece) : steps;
+    return isWithoutRefusal(steps, whole) ? read(bytes + "xxxxx", piece) : steps;
+}
+
+/// The quote of a chunk's extension that its line does not close is a fault once no more bytes are there, and
+/// may still be closed while there are some: but the line fits into the reader's room or is refused.
+Steps readWhole(const std::string& bytes, const Steps& pieces) {
+    Steps steps = read(bytes, SIZE_MAX);
+    return isWithoutRefusal(steps, pieces) ? read(bytes + std::string(room, 'x'), SIZE_MAX) : steps;
+}
+
+void checkSame(const std::string& bytes, std::size_t piece, const char* promise) {
+    const Steps pieces = readPieces(bytes, piece, read(bytes, SIZE_MAX));
+    checkSame(pieces, readWhole(bytes, pieces), promise);
 }
 
 } // namespace
@@ -90,8 +106,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         return 0;
     }
     const std::string bytes = velt::fuzz::textOf(data + 1, size - 1);
-    const Steps whole = read(bytes, SIZE_MAX);
-    checkSame(readPieces(bytes, 1, whole), whole, "byte by byte, the same requests are read");
-    checkSame(readPieces(bytes, 1 + data[0], whole), whole, "in pieces, the same requests are read");
+    checkSame(bytes, 1, "byte by byte, the same requests are read");
+    checkSame(bytes, 1 + data[0], "in pieces, the same requests are read");
     return 0;
 }
