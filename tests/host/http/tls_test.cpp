@@ -1,5 +1,6 @@
 // The server over TLS, and what it asks for before it can be reached from elsewhere.
 
+#include "host/http/tls_context.h"
 #include "tests/host/fake_standalone.h"
 #include "tests/host/host_test.h"
 #include "tests/support/fake_platform/fake_platform.h"
@@ -93,6 +94,12 @@ TEST_F(HostTls, RequestsAreServed) {
 TEST_F(HostTls, OlderVersionsAreNotSpoken) {
     start();
     EXPECT_EQ(askOverTls(requestText("GET", "/healthz", admin), TLS1_VERSION, TLS1_1_VERSION), "");
+}
+
+// The libraries of a test's machine may refuse them by themselves.
+TEST_F(HostTls, OlderVersionsAreRefusedWhateverTheLibraryAllows) {
+    const auto context = velt::host::makeTlsContext(tls);
+    EXPECT_EQ(SSL_CTX_get_min_proto_version(context->native_handle()), TLS1_2_VERSION);
 }
 
 TEST_F(HostTls, PlainHttpIsNotAnswered) {

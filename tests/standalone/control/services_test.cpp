@@ -277,6 +277,17 @@ TEST_F(ServicesTest, AfterABootOneThatFailsDoesNotHinderTheOther) {
     EXPECT_TRUE(accepts(sftpPort_));
 }
 
+TEST_F(ServicesTest, OfTwoFailuresTheFirstIsTold) {
+    storeSftp(true);
+    planDouble().ftpOptions = {"--refuse", "not today"};
+    planDouble().sftpOptions = {"--refuse", "not tomorrow"};
+    for (const std::string& refusal :
+         {messageOf(startEnabledServices()), messageOf(restartServices(SessionPolicy::keep))}) {
+        EXPECT_NE(refusal.find("not today"), std::string::npos) << refusal;
+        EXPECT_EQ(refusal.find("not tomorrow"), std::string::npos) << refusal;
+    }
+}
+
 TEST_F(ServicesTest, AllAreStoppedAndStartAgainAsTheyWere) {
     storeFtp(tls);
     storeSftp(true);
