@@ -49,8 +49,9 @@ HttpResponse notAllowed(const Call& call, const std::string& allow) {
 }
 
 HttpResponse tooBusy(const Call& call) {
-    HttpResponse response =
-        problem(503, "Too many requests are waiting, or veltd is stopping. Try again later.", call.id);
+    HttpResponse response = problem(
+        503, "Too many requests with this token or user are waiting, or veltd is stopping. Try again later.",
+        call.id);
     response.headers.emplace_back("Retry-After", "5");
     return response;
 }
@@ -193,7 +194,8 @@ void App::submit(const JobPointer& job, const Route& route) {
         return;
     }
     const bool accepted = order_.submit(
-        route.kind, [this, job, &route] { finish(job->done, job->call, answer(route, job->call)); },
+        route.kind, job->call.principal.holder,
+        [this, job, &route] { finish(job->done, job->call, answer(route, job->call)); },
         job->call.request.body.size());
     if (!accepted) {
         finish(job->done, job->call, tooBusy(job->call));

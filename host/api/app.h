@@ -30,7 +30,7 @@ struct AppSettings {
     AccessSettings access;
     std::filesystem::path tokenFile;
     unsigned workers = 4;                                        ///< threads on which modules run
-    std::size_t maxWaiting = 1000;                               ///< requests that wait for their turn
+    std::size_t maxWaiting = 1000;                               ///< requests of one caller, for their turn
     std::size_t maxWaitingBytes = std::size_t{16} * 1024 * 1024; ///< of their bodies
 };
 

@@ -68,7 +68,9 @@ struct Principal {
     Role role = Role::viewer;
     std::string actor;
     std::string address;
-    std::string holder;  ///< whose connections are counted together; "" when they are not limited
+    /// Whose connections are counted together and whose requests share their turns; "" is root, whose
+    /// connections are not limited.
+    std::string holder;
     std::string tokenId; ///< of the token that was shown; "" when there was none
 };
 

@@ -11,7 +11,8 @@ constexpr unsigned unorderedThreads = 2;
 } // namespace
 
 RequestOrder::RequestOrder(unsigned threads, std::size_t maxWaiting, std::size_t maxWaitingBytes)
-    : maxWaiting_(maxWaiting), maxWaitingBytes_(maxWaitingBytes) {
+    : ordered_{{maxWaiting, maxWaitingBytes}},
+      unordered_{{maxWaiting, maxWaitingBytes}}, searches_{{maxWaiting, maxWaitingBytes}} {
     try {
         start(ordered_, threads);
         start(unordered_, unorderedThreads);
@@ -26,15 +27,13 @@ RequestOrder::~RequestOrder() {
     stop();
 }
 
-bool RequestOrder::submit(Kind kind, Task task, std::size_t bytes) {
+bool RequestOrder::submit(Kind kind, const std::string& caller, Task task, std::size_t bytes) {
     Pool& pool = poolOf(kind);
     {
         const std::lock_guard lock(mutex_);
-        if (stopping_ || pool.queue.size() >= maxWaiting_ || pool.bytes + bytes > maxWaitingBytes_) {
+        if (stopping_ || !pool.waiting.add(caller, {kind, std::move(task), bytes})) {
             return false;
         }
-        pool.queue.push_back({kind, std::move(task), bytes});
-        pool.bytes += bytes;
     }
     pool.changed.notify_one();
     return true;
@@ -94,16 +93,14 @@ void RequestOrder::note(Kind kind, bool runs) {
 void RequestOrder::work(Pool& pool) {
     std::unique_lock lock(mutex_);
     while (true) {
-        if (pool.queue.empty() && stopping_) {
+        if (pool.waiting.empty() && stopping_) {
             return;
         }
-        if (pool.queue.empty() || !mayStart(pool.queue.front().kind)) {
+        if (pool.waiting.empty() || !mayStart(pool.waiting.next().kind)) {
             pool.changed.wait(lock);
             continue;
         }
-        Waiting next = std::move(pool.queue.front());
-        pool.queue.pop_front();
-        pool.bytes -= next.bytes;
+        WaitingRequest next = pool.waiting.takeNext();
         note(next.kind, true);
         lock.unlock();
         // The next one may be a read that can run at the same time.

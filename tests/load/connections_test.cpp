@@ -1,10 +1,9 @@
 // Many connections, most of which only wait.
 #include "host/base/open_file_limit.h"
+#include "tests/load/delays.h"
 #include "tests/load/load_service.h"
-#include "tests/support/waiting.h"
 
 #include <atomic>
-#include <ctime>
 #include <deque>
 #include <iostream>
 #include <thread>
@@ -12,55 +11,10 @@
 namespace velt::test {
 namespace {
 
-using std::chrono::microseconds;
 using std::chrono::milliseconds;
 
 constexpr std::size_t streamsOfOne = 32; ///< the most that one token may have
 constexpr std::size_t idleOfOne = 50;
-
-/// How much longer than alone a thread takes now that sleeps and then computes for a few milliseconds.
-class Sluggishness {
-public:
-    Sluggishness() : thread_([this] { measure(); }) {}
-    ~Sluggishness() { stop(); }
-    Sluggishness(const Sluggishness&) = delete;
-    Sluggishness& operator=(const Sluggishness&) = delete;
-
-    /// The worst so far.
-    microseconds stop() {
-        ended_ = true;
-        if (thread_.joinable()) {
-            thread_.join();
-        }
-        return worst_;
-    }
-
-private:
-    static microseconds processorTime() {
-        timespec time{};
-        clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
-        return std::chrono::seconds(time.tv_sec) +
-               std::chrono::duration_cast<microseconds>(std::chrono::nanoseconds(time.tv_nsec));
-    }
-
-    void measure() {
-        constexpr milliseconds nap(20);
-        constexpr milliseconds work(3);
-        while (!ended_) {
-            const auto began = Clock::now();
-            std::this_thread::sleep_for(nap);
-            const auto done = processorTime() + work;
-            while (processorTime() < done) {
-            }
-            const auto taken = std::chrono::duration_cast<microseconds>(Clock::now() - began);
-            worst_ = std::max(worst_, taken - nap - work);
-        }
-    }
-
-    std::atomic<bool> ended_{false};
-    microseconds worst_{0};
-    std::thread thread_;
-};
 
 class Connections : public LoadService {
 protected:
@@ -94,29 +48,6 @@ protected:
         }
     }
 
-    /// Asks once, over a new connection.
-    static void askOnce(const std::string& path, Durations& durations) {
-        const auto began = Clock::now();
-        Client root = asRoot();
-        EXPECT_EQ(root.ask(requestText("GET", path)).status, 200);
-        durations.add(std::chrono::duration_cast<microseconds>(Clock::now() - began));
-    }
-
-    static Durations ask(const std::string& path, int count) {
-        Durations durations;
-        for (int i = 0; i < count; ++i) {
-            askOnce(path, durations);
-        }
-        return durations;
-    }
-
-    /// Several threads take part in an answer, and each may be late by so much.
-    static void expectWithin(const Durations& durations, milliseconds promised, microseconds late) {
-        if (isLong()) {
-            EXPECT_LT(durations.worst(), promised + 3 * late);
-        }
-    }
-
     std::size_t idleCount = inLongForm(2000UL, 200UL);
     std::size_t streamCount = inLongForm(1000UL, 100UL);
     std::deque<Client> streams_;
@@ -133,7 +64,7 @@ TEST_F(Connections, InGreatNumberDelayNeitherRootNorTheSignOfLife) {
     Sluggishness quiet;
     const Durations root = ask(row, count);
     const Durations liveness = ask("/healthz", count);
-    const microseconds late = quiet.stop();
+    const auto late = quiet.stop();
     std::cout << idleCount << " idle, " << streamCount << " streams: root " << root.text() << "; liveness "
               << liveness.text() << "; the machine was late by " << late.count() << " us at worst\n";
     expectWithin(root, milliseconds(100), late);
@@ -161,7 +92,7 @@ TEST_F(Connections, GetEachEventAndDelayNothingThen) {
         askOnce("/api/tokens", root);
         askOnce("/healthz", liveness);
     }
-    const microseconds late = busy.stop();
+    const auto late = busy.stop();
     switcher.join();
     std::cout << "with events: root " << root.text() << "; liveness " << liveness.text()
               << "; the machine was late by " << late.count() << " us at worst\n";

@@ -13,7 +13,6 @@
 #include <filesystem>
 #include <fstream>
 #include <ostream>
-#include <sstream>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -46,13 +45,6 @@ long statusValue(const fs::path& process, const std::string& key) {
         }
     }
     return 0;
-}
-
-std::string inMilliseconds(std::chrono::microseconds duration) {
-    std::ostringstream text;
-    text.precision(1);
-    text << std::fixed << static_cast<double>(duration.count()) / 1000 << " ms";
-    return text.str();
 }
 
 } // namespace
@@ -124,17 +116,6 @@ std::ostream& operator<<(std::ostream& out, const Holdings& holdings) {
     return out << holdings.processes << " processes, " << holdings.threads << " threads, "
                << holdings.descriptors << " descriptors, " << holdings.files << " files, veltd "
                << holdings.hostKilobytes << " KiB, all others " << holdings.othersKilobytes << " KiB";
-}
-
-std::chrono::microseconds Durations::percentile(unsigned percent) const {
-    std::vector<std::chrono::microseconds> sorted = all_;
-    std::ranges::sort(sorted);
-    return sorted.empty() ? std::chrono::microseconds(0) : sorted[(sorted.size() - 1) * percent / 100];
-}
-
-std::string Durations::text() const {
-    return "worst " + inMilliseconds(worst()) + ", 99 % within " + inMilliseconds(percentile(99)) +
-           ", half within " + inMilliseconds(percentile(50)) + ", of " + std::to_string(all_.size());
 }
 
 } // namespace velt::test

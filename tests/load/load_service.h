@@ -9,9 +9,7 @@
 #include "tests/host/client.h"
 #include "tests/system/support/host_service.h"
 
-#include <chrono>
 #include <string>
-#include <vector>
 
 namespace velt::test {
 
@@ -32,6 +30,10 @@ struct Holdings {
 };
 
 class LoadService : public HostService {
+public:
+    /// A connection as root on the Unix socket.
+    static Client asRoot();
+
 protected:
     /// Puts the stand-ins in the place of both daemons, and switches both services on.
     void SetUp() override;
@@ -40,9 +42,6 @@ protected:
     void reap() const;
     Holdings holdings() const;
 
-    /// A connection as root on the Unix socket.
-    static Client asRoot();
-
     /// A set of FTP settings as JSON members, such as "\"timeout\":5", with FTP on.
     static Answer setFtp(Client& client, const std::string& members);
     static Answer post(Client& client, const std::string& path, const std::string& body);
@@ -50,19 +49,6 @@ protected:
 };
 
 std::ostream& operator<<(std::ostream& out, const Holdings& holdings);
-
-/// Durations, told by their percentiles.
-class Durations {
-public:
-    void add(std::chrono::microseconds duration) { all_.push_back(duration); }
-    std::chrono::microseconds worst() const { return percentile(100); }
-    std::chrono::microseconds percentile(unsigned percent) const;
-    /// "worst 3.1 ms, 99 % within 2.0 ms, half within 0.4 ms, of 1000"
-    std::string text() const;
-
-private:
-    std::vector<std::chrono::microseconds> all_;
-};
 
 } // namespace velt::test
 

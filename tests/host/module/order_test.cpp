@@ -41,8 +41,9 @@ protected:
     }
 
     /// A call that lasts until letGo().
-    std::string callThatLasts(const std::string& method) const {
-        return requestText("POST", "/api/VELT.Test.Order/v1/" + method, admin,
+    std::string callThatLasts(const std::string& method) const { return callThatLasts(method, admin); }
+    std::string callThatLasts(const std::string& method, const std::string& headers) const {
+        return requestText("POST", "/api/VELT.Test.Order/v1/" + method, headers,
                            R"({"folder":")" + folder.string() + "\"}");
     }
 
@@ -161,12 +162,37 @@ TEST_F(HostOrder, TooManyWaitingRequestsAreTurnedAway) {
     EXPECT_EQ(refused, 2);
 }
 
+TEST_F(HostOrder, OneTokenThatHasTooManyWaitingTurnsNobodyElseAway) {
+    settings.workers = 1;
+    settings.maxWaiting = 2;
+    start();
+    std::vector<Client> clients;
+    const auto oneIsRefused = [&clients] {
+        return velt::test::waitUntil([&] { return std::ranges::count_if(clients, isAnswered) == 1; },
+                                     seconds(20));
+    };
+    for (int i = 0; i < 4; ++i) {
+        clients.push_back(connect());
+        clients.back().send(callThatLasts("get_wait", viewer));
+        ASSERT_TRUE(running(1));
+    }
+    EXPECT_TRUE(oneIsRefused()) << "one runs and two wait";
+    clients.clear();
+    for (int i = 0; i < 3; ++i) {
+        clients.push_back(Client::unixSocket(socketPath));
+        clients.back().send(callThatLasts("get_wait", ""));
+    }
+    EXPECT_TRUE(oneIsRefused()) << "two of root's wait";
+    letGo();
+    EXPECT_EQ(std::ranges::count_if(clients, [](Client& each) { return each.receive().status == 204; }), 2);
+}
+
 TEST(RequestOrder, WhatWaitsHoldsALimitedNumberOfBytes) {
     RequestOrder order(1, 100, 1000);
     std::promise<void> started;
     std::promise<void> release;
     ASSERT_TRUE(order.submit(
-        Kind::write,
+        Kind::write, "one",
         [&] {
             started.set_value();
             release.get_future().wait();
@@ -174,19 +200,19 @@ TEST(RequestOrder, WhatWaitsHoldsALimitedNumberOfBytes) {
         1000));
     started.get_future().wait();
     EXPECT_TRUE(order.submit(
-        Kind::read, [] {}, 600))
+        Kind::read, "one", [] {}, 600))
         << "the one that runs does not wait";
     EXPECT_FALSE(order.submit(
-        Kind::read, [] {}, 401));
+        Kind::read, "one", [] {}, 401));
     EXPECT_TRUE(order.submit(
-        Kind::read, [] {}, 400));
-    EXPECT_TRUE(order.submit(Kind::read, [] {}));
+        Kind::read, "one", [] {}, 400));
+    EXPECT_TRUE(order.submit(Kind::read, "one", [] {}));
     std::promise<void> last;
-    EXPECT_TRUE(order.submit(Kind::write, [&] { last.set_value(); }));
+    EXPECT_TRUE(order.submit(Kind::write, "one", [&] { last.set_value(); }));
     release.set_value();
     last.get_future().wait();
     EXPECT_TRUE(order.submit(
-        Kind::read, [] {}, 1000));
+        Kind::read, "one", [] {}, 1000));
 }
 
 TEST(RequestOrder, AReadThatComesAfterAWaitingWriteWaitsForIt) {
@@ -199,16 +225,16 @@ TEST(RequestOrder, AReadThatComesAfterAWaitingWriteWaitsForIt) {
         sequence += name;
     };
     std::promise<void> begun;
-    ASSERT_TRUE(order.submit(Kind::read, [&] {
+    ASSERT_TRUE(order.submit(Kind::read, "one", [&] {
         begun.set_value();
         release.get_future().wait();
         note('1');
     }));
     begun.get_future().wait();
-    ASSERT_TRUE(order.submit(Kind::write, [&] { note('W'); }));
-    ASSERT_TRUE(order.submit(Kind::read, [&] { note('2'); }));
+    ASSERT_TRUE(order.submit(Kind::write, "one", [&] { note('W'); }));
+    ASSERT_TRUE(order.submit(Kind::read, "one", [&] { note('2'); }));
     std::promise<void> beside;
-    ASSERT_TRUE(order.submit(Kind::unordered, [&] { beside.set_value(); }));
+    ASSERT_TRUE(order.submit(Kind::unordered, "one", [&] { beside.set_value(); }));
     beside.get_future().wait();
     release.set_value();
     order.stop();
@@ -222,7 +248,7 @@ TEST(RequestOrder, SearchesDelayNothingElse) {
     std::atomic<int> running{0};
     std::atomic<int> most{0};
     for (int i = 0; i < 10; ++i) {
-        ASSERT_TRUE(order.submit(Kind::search, [&, released] {
+        ASSERT_TRUE(order.submit(Kind::search, "one", [&, released] {
             most = std::max<int>(most, ++running);
             released.wait();
             --running;
@@ -230,8 +256,8 @@ TEST(RequestOrder, SearchesDelayNothingElse) {
     }
     std::promise<void> unordered;
     std::promise<void> ordered;
-    ASSERT_TRUE(order.submit(Kind::unordered, [&] { unordered.set_value(); }));
-    ASSERT_TRUE(order.submit(Kind::write, [&] { ordered.set_value(); }));
+    ASSERT_TRUE(order.submit(Kind::unordered, "one", [&] { unordered.set_value(); }));
+    ASSERT_TRUE(order.submit(Kind::write, "one", [&] { ordered.set_value(); }));
     EXPECT_EQ(unordered.get_future().wait_for(seconds(10)), std::future_status::ready);
     EXPECT_EQ(ordered.get_future().wait_for(seconds(10)), std::future_status::ready);
     release.set_value();
@@ -243,14 +269,14 @@ TEST(RequestOrder, AStopFinishesWhatWaitsAndTakesNoMore) {
     RequestOrder order(2, 100, 0);
     std::atomic<int> done{0};
     for (int i = 0; i < 20; ++i) {
-        EXPECT_TRUE(order.submit(i % 2 == 0 ? Kind::write : Kind::read, [&] {
+        EXPECT_TRUE(order.submit(i % 2 == 0 ? Kind::write : Kind::read, "one", [&] {
             std::this_thread::sleep_for(milliseconds(1));
             ++done;
         }));
     }
     order.stop();
     EXPECT_EQ(done, 20);
-    EXPECT_FALSE(order.submit(Kind::read, [] {}));
+    EXPECT_FALSE(order.submit(Kind::read, "one", [] {}));
 }
 
 } // namespace
