@@ -19,8 +19,8 @@ template<class Stream>
 class EventStream final : public EventReader, public std::enable_shared_from_this<EventStream<Stream>> {
 public:
     explicit EventStream(std::shared_ptr<Session<Stream>> session)
-        : session_(std::move(session)), strand_(session_->shared_.context.get_executor()),
-          heartbeat_(session_->shared_.context) {}
+        : session_(std::move(session)), strand_(session_->lane_.context.get_executor()),
+          heartbeat_(session_->lane_.context) {}
 
     static void start(const std::shared_ptr<Session<Stream>>& session) {
         const auto stream = std::make_shared<EventStream>(session);
@@ -38,7 +38,7 @@ public:
     }
 
     void deliver(const std::shared_ptr<const std::string>& event) override {
-        session_->shared_.turns.add([self = this->shared_from_this(), event] {
+        session_->lane_.turns.add([self = this->shared_from_this(), event] {
             boost::asio::dispatch(self->strand_, [self, event] { self->push(event); });
         });
     }

@@ -11,6 +11,7 @@
 #include <netinet/tcp.h>
 #include <unistd.h>
 
+#include <array>
 #include <functional>
 #include <mutex>
 #include <thread>
@@ -32,12 +33,14 @@ constexpr std::size_t refusedConnections = 64;
 struct HttpServer::Core {
     /// One listening socket and its acceptor.
     struct Door {
-        Door(asio::io_context& context, Listener socket)
-            : listener(std::move(socket)), acceptor(context), peer(context), pause(context) {
+        Door(Lane& itsLane, Listener socket)
+            : lane(itsLane), listener(std::move(socket)), acceptor(lane.context), peer(lane.context),
+              pause(lane.context) {
             // Both close their descriptor, so each has its own.
             acceptor.assign({listener.isUnixSocket() ? AF_UNIX : AF_INET, 0}, dup(listener.descriptor()));
         }
 
+        Lane& lane; ///< of all sessions that come in here
         Listener listener;
         Acceptor acceptor;
         PlainStream peer;
@@ -45,7 +48,7 @@ struct HttpServer::Core {
     };
 
     Core(HttpHandler& theHandler, const HttpLimits& theLimits, const TlsFiles& tls)
-        : shared{theHandler, theLimits}, tlsContext(makeTlsContext(tls)), sweeper(context) {}
+        : shared{theHandler, theLimits}, tlsContext(makeTlsContext(tls)), sweeper(tcp.context) {}
 
     /// With the lock of the doors, once the threads run.
     void accept(Door& door) {
@@ -86,19 +89,19 @@ struct HttpServer::Core {
         // Idle connections must not keep out clients that have a request, and none may keep out root.
         if (!isOwn(peer) && open >= limits.connections && !connections.makeRoom()) {
             if (!isTls && open < limits.connections + refusedConnections) {
-                make<PlainStream>(std::move(socket), std::move(peer))->refuse();
+                make<PlainStream>(door.lane, std::move(socket), std::move(peer))->refuse();
             }
             return;
         }
         if (isTls) {
-            make<TlsStream>(TlsStream(std::move(socket), *tlsContext), std::move(peer))->start();
+            make<TlsStream>(door.lane, TlsStream(std::move(socket), *tlsContext), std::move(peer))->start();
         } else {
-            make<PlainStream>(std::move(socket), std::move(peer))->start();
+            make<PlainStream>(door.lane, std::move(socket), std::move(peer))->start();
         }
     }
 
-    template<class Stream> std::shared_ptr<Session<Stream>> make(Stream stream, Peer peer) {
-        auto session = std::make_shared<Session<Stream>>(shared, std::move(stream), std::move(peer));
+    template<class Stream> std::shared_ptr<Session<Stream>> make(Lane& lane, Stream stream, Peer peer) {
+        auto session = std::make_shared<Session<Stream>>(shared, lane, std::move(stream), std::move(peer));
         connections.add(session);
         return session;
     }
@@ -123,8 +126,8 @@ struct HttpServer::Core {
     }
 
     void join() {
-        work.reset();
-        context.stop();
+        tcp.context.stop();
+        local.context.stop();
         for (std::thread& thread : threads) {
             thread.join();
         }
@@ -133,10 +136,12 @@ struct HttpServer::Core {
 
     SessionShared shared;
     const HttpLimits& limits = shared.limits;
-    asio::io_context& context = shared.context;
+    Lane tcp;
+    Lane local; ///< of the Unix sockets: administrators do not wait for what the network asks
     std::unique_ptr<asio::ssl::context> tlsContext;
     Connections connections;
-    asio::executor_work_guard<Executor> work{context.get_executor()};
+    std::array<asio::executor_work_guard<Executor>, 2> work{asio::make_work_guard(tcp.context),
+                                                            asio::make_work_guard(local.context)};
     std::mutex doorMutex; ///< of both below: a door may not be closed while another thread accepts
     std::vector<std::unique_ptr<Door>> doors;
     bool stopping = false;
@@ -152,7 +157,8 @@ HttpServer::~HttpServer() {
 }
 
 void HttpServer::add(Listener listener) {
-    core_->doors.push_back(std::make_unique<Core::Door>(core_->context, std::move(listener)));
+    Lane& lane = listener.isUnixSocket() ? core_->local : core_->tcp;
+    core_->doors.push_back(std::make_unique<Core::Door>(lane, std::move(listener)));
 }
 
 void HttpServer::start(unsigned threads) {
@@ -160,8 +166,9 @@ void HttpServer::start(unsigned threads) {
     for (const auto& door : core_->doors) {
         core_->accept(*door);
     }
+    core_->threads.emplace_back([this] { core_->local.context.run(); });
     for (unsigned i = 0; i < threads; ++i) {
-        core_->threads.emplace_back([this] { core_->context.run(); });
+        core_->threads.emplace_back([this] { core_->tcp.context.run(); });
     }
 }
 

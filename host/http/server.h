@@ -49,6 +49,7 @@ public:
     /// Call it before start(). TCP listeners use TLS if there is a certificate, Unix sockets never do.
     void add(Listener listener);
 
+    /// So many threads serve what comes over TCP, and one more what comes over Unix sockets.
     void start(unsigned threads);
 
     /// Stops accepting, ends idle connections and streams of events at once, and waits up to `patience` until

@@ -44,9 +44,14 @@ struct SessionShared {
     const HttpLimits limits;
     Places connectionPlaces{limits.connectionsOfOne};
     Places eventStreamPlaces{limits.eventStreamsOfOne};
-    boost::asio::io_context context{}; // after the places, which sessions that it still holds give back
-    Turns turns{context};
     std::atomic<std::size_t> delayedRefusals{0};
+};
+
+/// What sessions run on: those of one lane do not wait for the threads of another. Outlives them, but for
+/// those that it still holds when it ends; what they share outlives it.
+struct Lane {
+    boost::asio::io_context context{};
+    Turns turns{context};
 };
 
 /// Only one operation is in flight at a time, so a session needs no strand. A pending operation keeps it
@@ -54,9 +59,10 @@ struct SessionShared {
 template<class Stream>
 class Session final : public Connection, public std::enable_shared_from_this<Session<Stream>> {
 public:
-    Session(SessionShared& shared, Stream stream, Peer peer)
-        : shared_(shared), stream_(std::move(stream)), timer_(shared.context), peer_(std::move(peer)),
-          handler_(shared.handler), limits_(shared.limits), reader_(limits_.head, limits_.body) {
+    Session(SessionShared& shared, Lane& lane, Stream stream, Peer peer)
+        : shared_(shared), lane_(lane), stream_(std::move(stream)), timer_(lane.context),
+          peer_(std::move(peer)), handler_(shared.handler), limits_(shared.limits),
+          reader_(limits_.head, limits_.body) {
         if (isOwn(peer_)) {
             trust();
         }
@@ -209,8 +215,7 @@ private:
         withBody_ = request.method != "HEAD";
         handler_.handle(std::move(request), principal_,
                         [self = this->shared_from_this()](HttpResponse response) {
-                            auto& context = self->shared_.context;
-                            boost::asio::post(context, [self, answer = std::move(response)] {
+                            boost::asio::post(self->lane_.context, [self, answer = std::move(response)] {
                                 self->respond(answer, self->reader_.keepAlive());
                             });
                         });
@@ -272,6 +277,7 @@ private:
     }
 
     SessionShared& shared_;
+    Lane& lane_;
     Stream stream_;
     Timer timer_;
     Peer peer_;
