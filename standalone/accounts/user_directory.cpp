@@ -286,6 +286,10 @@ Result<> usersAreKnown() {
     return directory().usersRead();
 }
 
+Result<> groupsAreKnown() {
+    return directory().groupsRead();
+}
+
 Result<UserEntry> findUser(const std::string& name) {
     if (auto user = userByName(name)) {
         return std::move(*user);
@@ -298,7 +302,7 @@ Result<GroupEntry> findGroup(const std::string& name) {
     if (auto group = groupByName(name)) {
         return std::move(*group);
     }
-    VELT_RETURN_IF_ERROR(directory().groupsRead());
+    VELT_RETURN_IF_ERROR(groupsAreKnown());
     return Error(ErrorNumber::notFound, "There is no group \"" + plainText(name, longestNameShown) + "\".");
 }
 

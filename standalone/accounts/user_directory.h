@@ -50,8 +50,9 @@ std::optional<GroupEntry> groupByName(const std::string& name);
 std::optional<GroupEntry> groupById(gid_t gid);
 
 /// An error when the local users could not be read when they were last asked for: one that was not found may
-/// exist.
+/// exist. The same of groups.
 Result<> usersAreKnown();
+Result<> groupsAreKnown();
 
 /// As userByName and groupByName; a missing account is an error, and so is one that cannot be told.
 Result<UserEntry> findUser(const std::string& name);

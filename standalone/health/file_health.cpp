@@ -1,5 +1,6 @@
 #include "base/file.h"
 #include "base/trusted_file.h"
+#include "standalone/accounts/user_directory.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/health/checks.h"
@@ -15,6 +16,7 @@ namespace velt {
 namespace {
 
 constexpr std::chrono::seconds accountLimit{2};
+constexpr const char* readableAccounts = "chmod 644 /etc/passwd /etc/group";
 
 /// The accounts that the files name, with where each stands, in words.
 using Mentions = std::map<NamedAccount, std::string>;
@@ -133,6 +135,13 @@ void judgeAccounts(const Mentions& mentions, Findings& findings) {
                             "The sources of users and groups take longer than two seconds to answer.",
                             "getent passwd"});
         return;
+    }
+    for (const Result<>& known : {usersAreKnown(), groupsAreKnown()}) {
+        if (!unknown->empty() && !known) { // they may be there
+            findings.push_back(
+                {"accounts-unreadable", Severity::error, "host", known.error().message, readableAccounts});
+            return;
+        }
     }
     for (const NamedAccount& account : *unknown) {
         findings.push_back(unknownAccount(account, mentions.at(account)));

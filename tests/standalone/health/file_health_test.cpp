@@ -76,6 +76,16 @@ TEST_F(FileHealth, AccountsThatNobodyKnowsAreNamed) {
     EXPECT_EQ(fileFindings(), Findings()) << "the daemon's own accounts count";
 }
 
+TEST_F(FileHealth, AccountsThatCannotBeReadAreNotCalledUnknown) {
+    writeShares(R"("dora": "read")", "");
+    EXPECT_EQ(summary(fileFindings()), "warning shares-unknown-account");
+    std::filesystem::remove(root_.path() / "passwd");
+    std::filesystem::create_directory(root_.path() / "passwd");
+    const Findings found = fileFindings();
+    EXPECT_EQ(summary(found), "error accounts-unreadable");
+    EXPECT_TRUE(found.at(0).sentence.starts_with("Cannot read ")) << found.at(0).sentence;
+}
+
 TEST_F(FileHealth, AMissingFileOfRulesIsNamedAndItsCommandMendsThat) {
     ASSERT_EQ(messageOf(expectRules()), "");
     std::filesystem::remove(rules());
