@@ -2,6 +2,7 @@
 
 #include "standalone/core/scratch_folder.h"
 #include "standalone/core/state_root.h"
+#include "standalone/journal/admin_log.h"
 #include "standalone/rules/rule_store.h"
 #include "standalone/settings/settings.h"
 
@@ -24,6 +25,7 @@ Result<> makeFirstRules() {
     if (!mayHaveHadRules()) {
         VELT_RETURN_IF_ERROR(makeRulesFile());
     }
+    (void)queryLog({}); // makes the log, too, before it can be missed
     return expectRules();
 }
 

@@ -1,5 +1,6 @@
 #include "standalone/journal/admin_log.h"
 
+#include "base/file.h"
 #include "base/plain_text.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/error_number.h"
@@ -23,6 +24,10 @@ constexpr std::size_t longestText = 1024;
 constexpr std::size_t longestActor = 255;
 constexpr int longestPage = 1000;
 
+constexpr int logCategory = 2;
+constexpr int logLevel = 1;
+constexpr unsigned beginsAnew = 0x11BF0015;
+
 struct Connection {
     std::mutex mutex;
     std::unique_ptr<LogDatabase> database;
@@ -31,20 +36,6 @@ struct Connection {
 Connection& connection() {
     static Connection instance;
     return instance;
-}
-
-/// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held.
-Result<LogDatabase*> currentDatabase(Connection& open) {
-    if (open.database != nullptr && !open.database->isOwn()) {
-        return Error(ErrorNumber::log,
-                     "A process that was forked off while the administrator log was open cannot use it.");
-    }
-    const std::filesystem::path path = statePath(paths::logDatabase);
-    if (open.database == nullptr || !open.database->leadsTo(path)) {
-        open.database.reset();
-        VELT_ASSIGN_OR_RETURN(open.database, LogDatabase::open(path));
-    }
-    return open.database.get();
 }
 
 /// Keeping too much harms less than losing an entry, or deleting by a rule that nobody wrote.
@@ -71,6 +62,33 @@ LogEntry makeEntry(int category, int level, unsigned event, const std::array<con
     entry.actor = plainText(requestActor().actor, longestActor);
     entry.address = plainText(requestActor().address, longestActor);
     return entry;
+}
+
+/// Whoever reads the new log would take it for the whole one.
+void noteLoss(LogDatabase& database) {
+    LogEntry entry = makeEntry(logCategory, logLevel, beginsAnew, {});
+    entry.actor.clear(); // nobody who asks now has lost it
+    entry.address.clear();
+    (void)database.append(entry, std::nullopt);
+}
+
+/// Opens the log when it is not open, or leads to a file that was moved away. The connection's lock is held.
+Result<LogDatabase*> currentDatabase(Connection& open) {
+    if (open.database != nullptr && !open.database->isOwn()) {
+        return Error(ErrorNumber::log,
+                     "A process that was forked off while the administrator log was open cannot use it.");
+    }
+    const std::filesystem::path path = statePath(paths::logDatabase);
+    if (open.database == nullptr || !open.database->leadsTo(path)) {
+        const bool hadOne = (open.database != nullptr && open.database->path() == path) ||
+                            fileExists(statePath(paths::initialized));
+        open.database.reset();
+        VELT_ASSIGN_OR_RETURN(open.database, LogDatabase::open(path));
+        if (hadOne && open.database->isNew()) {
+            noteLoss(*open.database);
+        }
+    }
+    return open.database.get();
 }
 
 Result<> store(LogEntry& entry) {

@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 35> entries{{
+constexpr std::array<CatalogueEntry, 36> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -50,6 +50,7 @@ constexpr std::array<CatalogueEntry, 35> entries{{
     {0x11BF0012, "The %1 service was started by another program."},
     {0x11BF0013, "The %1 service was stopped by another program."},
     {0x11BF0014, "The %1 service is on, but could not be started: %2."},
+    {0x11BF0015, "The administrator log begins here: its former file was moved away or deleted."},
 }};
 
 std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4>& texts) {

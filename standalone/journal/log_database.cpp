@@ -102,6 +102,7 @@ Result<> LogDatabase::makeTable() {
     }
     const std::int64_t found = version.number(0);
     version.reset();
+    isNew_ = found == 0;
     if (found != 0 && found != formVersion) {
         return Error(ErrorNumber::log, "The administrator log " + path_.string() + " has format " +
                                            std::to_string(found) + ", which this version does not know.");

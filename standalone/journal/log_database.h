@@ -35,6 +35,12 @@ public:
     /// Whether this is a connection to the file that `path` names now.
     bool leadsTo(const std::filesystem::path& path) const;
 
+    /// The name by which it was opened.
+    const std::filesystem::path& path() const { return path_; }
+
+    /// Whether there was no log before it was opened.
+    bool isNew() const { return isNew_; }
+
     /// Adds the entry, whose id it sets, and removes what `retention` (when given) no longer keeps, together
     /// or not at all.
     Result<> append(LogEntry& entry, const std::optional<LogRetention>& retention);
@@ -57,6 +63,7 @@ private:
     pid_t process_;
     DatabaseOwner database_;
     std::unique_ptr<Statements> statements_;
+    bool isNew_ = false;
 };
 
 } // namespace velt

@@ -238,8 +238,22 @@ TEST_F(AdminLogTest, StartsAnewWhenTheFileWasMovedAway) {
     logUser("old");
     for (const char* name : {"log.db", "log.db-wal", "log.db-shm"})
         std::filesystem::rename(folder_.path() / "var/lib/velt" / name, folder_.path() / name);
+    setRequestActor("anna", "192.0.2.1");
     logUser("new");
-    EXPECT_EQ(firstTexts(query()), Lines{"new"});
+    setRequestActor("", "");
+    const auto entries = query();
+    ASSERT_EQ(entries.size(), 2U);
+    EXPECT_EQ(entries[0].texts[0], "new");
+    EXPECT_EQ(entries[1].sentence,
+              "The administrator log begins here: its former file was moved away or deleted.");
+    EXPECT_EQ(entries[1].actor, "") << "whoever comes next has not done it";
+}
+
+TEST_F(AdminLogTest, SaysThatItWasDeletedBeforeTheStart) {
+    folder_.write("var/lib/velt/initialized", "");
+    logUser("new");
+    EXPECT_EQ(query().size(), 2U);
+    EXPECT_EQ(query().back().event, 0x11BF0015U);
 }
 
 TEST_F(AdminLogTest, AForkedChildIsRefusedInsteadOfBreakingTheDatabase) {
