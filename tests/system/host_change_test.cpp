@@ -1,4 +1,5 @@
 // Changes of real services: ports that change hands, refusals, and changes that nobody confirms.
+#include "tests/support/files.h"
 #include "tests/support/text.h"
 #include "tests/support/waiting.h"
 #include "tests/system/support/plan_service.h"
@@ -37,6 +38,23 @@ TEST_F(HostChange, aTakenPortIsFoundByTheDryRunToo) {
     const HttpResult real = patch(body);
     EXPECT_EQ(real.status, 409);
     EXPECT_EQ(real.json["detail"], dry.json["detail"]);
+}
+
+TEST_F(HostChange, aCertificateThatCannotBeUsedIsNoFaultOfTheRequest) {
+    done({"ftp", "set", "enable_ftps=on"});
+    std::filesystem::create_directories(worldRoot / "etc/velt/tls");
+    writeFile(worldRoot / "etc/velt/tls/server.crt", "nonsense");
+    const std::string body = R"({"ftp": {"timeout": 411}})";
+    const HttpResult dry = patch(body, "?dry_run=true");
+    EXPECT_EQ(dry.status, 409) << dry.body;
+    EXPECT_EQ(dry.json["title"], "The certificate of FTPS cannot be used");
+    const HttpResult real = patch(body);
+    EXPECT_EQ(real.status, 409);
+    EXPECT_EQ(real.json["title"], dry.json["title"]);
+    EXPECT_EQ(real.json["detail"], dry.json["detail"]);
+    EXPECT_EQ(curl("/api/restart", "{}", {"--request", "POST"}).status, 409);
+    std::filesystem::remove(worldRoot / "etc/velt/tls/server.crt");
+    EXPECT_EQ(patch(body).status, 200);
 }
 
 TEST_F(HostChange, whatDoctorWouldFindIsAWarningOfThePlan) {
