@@ -40,6 +40,7 @@ std::string labelOf(const SeenCall& call) {
     return label;
 }
 
+constexpr const char* beginMark = "/begin of the faults";
 constexpr const char* endMark = "/end of the faults";
 
 struct Fault {
@@ -51,12 +52,14 @@ struct Fault {
 /// Tells calls apart while a run goes on.
 class Counter {
 public:
-    explicit Counter(const FaultSweep& sweep) : sweep_(sweep) {}
+    explicit Counter(const FaultSweep& sweep) : sweep_(sweep), begun_(!sweep.hasBegin) {}
 
     /// The call's label and occurrence; no label for one that is not failed.
     Fault next(const SeenCall& call) {
+        begun_ = begun_ || call.subject == beginMark;
         over_ = over_ || call.subject == endMark;
-        if (over_ || !(sweep_.counts ? sweep_.counts(call) : !isLoading(call))) {
+        if (!begun_ || over_ || call.subject == beginMark ||
+            !(sweep_.counts ? sweep_.counts(call) : !isLoading(call))) {
             return {};
         }
         const std::string label = labelOf(call);
@@ -66,6 +69,7 @@ public:
 private:
     const FaultSweep& sweep_;
     std::map<std::string, int> counts_;
+    bool begun_;
     bool over_ = false;
 };
 
@@ -184,6 +188,10 @@ bool runWith(const Fault& fault, const FaultSweep& sweep) {
 }
 
 } // namespace
+
+void beginFaults() {
+    (void)::access(beginMark, F_OK);
+}
 
 void endFaults() {
     (void)::access(endMark, F_OK);

@@ -44,6 +44,9 @@ struct FaultSweep {
     /// started may still run; nothing of it must be left at the end.
     std::function<void(const SweptRun&)> check;
 
+    /// Nothing fails before the operation has called beginFaults().
+    bool hasBegin = false;
+
     Share share = Share::firstAndLast;
 
     /// Where a run takes long: how many of these there are for one that fails, unless the environment has
@@ -53,7 +56,8 @@ struct FaultSweep {
     std::chrono::milliseconds limit{10'000}; ///< for one run; the test fails past it
 };
 
-/// Called within the operation: what follows is no part of it, and does not fail.
+/// Called within the operation: what comes before, or after, is no part of it, and does not fail.
+void beginFaults();
 void endFaults();
 
 /// Whether the call loads a program, its libraries, or what belongs to these.
