@@ -2,25 +2,32 @@
 
 #include "standalone/standalone.h"
 
+#include <algorithm>
 #include <exception>
-#include <utility>
 
 namespace velt::host {
 
-WrongTokens::WrongTokens(HostLog& log, std::size_t maxWaiting)
-    : log_(log), maxWaiting_(maxWaiting), thread_([this] { run(); }) {}
+WrongTokens::WrongTokens(HostLog& log, std::size_t maxSources)
+    : log_(log), maxSources_(maxSources), thread_([this] { run(); }) {}
 
 WrongTokens::~WrongTokens() {
     stop();
 }
 
 void WrongTokens::note(const std::string& address) {
+    const std::string source = sourceOfLogin(address);
     {
         const std::lock_guard lock(mutex_);
-        if (stopping_ || waiting_.size() >= maxWaiting_) {
+        auto place = std::ranges::find(waiting_, source, &Waiting::source);
+        const bool full =
+            place == waiting_.end() ? waiting_.size() >= maxSources_ : place->tokens >= mostOfOne;
+        if (stopping_ || full) {
             return;
         }
-        waiting_.push_back(address);
+        if (place == waiting_.end()) {
+            place = waiting_.insert(place, {source, address});
+        }
+        ++place->tokens;
     }
     changed_.notify_all();
 }
@@ -43,12 +50,23 @@ void WrongTokens::run() {
         if (stopping_) {
             return;
         }
-        const std::string address = std::move(waiting_.front());
-        waiting_.pop_front();
+        const std::string address = takeNext();
         lock.unlock();
         count(address);
         lock.lock();
     }
+}
+
+/// The sources take turns.
+std::string WrongTokens::takeNext() {
+    Waiting& next = waiting_.front();
+    std::string address = next.address;
+    if (--next.tokens == 0) {
+        waiting_.pop_front();
+    } else {
+        waiting_.splice(waiting_.end(), waiting_, waiting_.begin());
+    }
+    return address;
 }
 
 void WrongTokens::count(const std::string& address) {

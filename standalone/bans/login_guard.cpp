@@ -114,6 +114,11 @@ void noteFailedLogin(const std::string& service, const std::string& address) {
     }
 }
 
+std::string sourceOfLogin(const std::string& address) {
+    const auto network = parseIpAddress(address);
+    return network ? toText(sourceOf(*network)) : "";
+}
+
 Result<CurrentBans> currentBans() {
     CurrentBans current;
     VELT_ASSIGN_OR_RETURN(current.bans, bansAt(Clock::now()));

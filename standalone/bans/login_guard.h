@@ -23,6 +23,9 @@ void noteFailedLogin(const std::string& service, const IpNetwork& address);
 /// The same for an address as text; one that is none is passed over.
 void noteFailedLogin(const std::string& service, const std::string& address);
 
+/// Whose failures are counted together with those of this address, as text; "" for a text that is no address.
+std::string sourceOfLogin(const std::string& address);
+
 struct CurrentBans {
     std::vector<Ban> bans; ///< in the order in which they end
     bool firewall = false; ///< whether the firewall refuses them; else only veltd does

@@ -24,6 +24,10 @@ void noteFailedLogin(const std::string& service, const std::string& address) {
     FakeStandalone::instance().failedLogins.push_back(service + " " + address);
 }
 
+std::string sourceOfLogin(const std::string& address) {
+    return address.substr(0, address.find("::")); // nearly as in earnest
+}
+
 Result<CurrentBans> currentBans() {
     const FakeStandalone& fake = FakeStandalone::instance();
     return fake.bansFail ? Result<CurrentBans>(Error(fake.sentence)) : CurrentBans{fake.bans, true};

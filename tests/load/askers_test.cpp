@@ -119,5 +119,9 @@ TEST_F(AskersOfOneToken, DelayNobodyElse) {
     measure({"/metrics", "/api/settings"});
 }
 
+TEST_F(AskersOfOneToken, DelayNobodyElseWithWhatIsAnsweredAtOnce) {
+    measure({"/openapi.json"});
+}
+
 } // namespace
 } // namespace velt::test

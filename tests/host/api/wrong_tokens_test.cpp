@@ -99,6 +99,26 @@ TEST_F(CountingWrongTokens, DropsWhatDoesNotFit) {
               (Texts{"veltd 192.0.2.1", "veltd 192.0.2.2", "veltd 192.0.2.3", "veltd 192.0.2.5"}));
 }
 
+TEST_F(CountingWrongTokens, LosesNoneOfOneSourceBecauseOfAnother) {
+    const auto gate = holdNoted();
+    WrongTokens tokens(log, 2);
+    tokens.note("2001:db8:1::1");
+    ASSERT_TRUE(isHeld(*gate));
+    for (int i = 0; i < 3 * WrongTokens::mostOfOne; ++i) {
+        tokens.note("2001:db8:1::" + std::to_string(i));
+    }
+    tokens.note("192.0.2.2");
+    tokens.note("192.0.2.2");
+    gate->open = true;
+    ASSERT_TRUE(waitUntil([&] { return fake.noted().size() >= WrongTokens::mostOfOne + 3; }, patience));
+    tokens.stop();
+    const Texts noted = fake.noted();
+    EXPECT_EQ(noted.size(), WrongTokens::mostOfOne + 3);
+    EXPECT_EQ(Texts(noted.begin(), noted.begin() + 6),
+              (Texts{"veltd 2001:db8:1::1", "veltd 2001:db8:1::0", "veltd 192.0.2.2", "veltd 2001:db8:1::0",
+                     "veltd 192.0.2.2", "veltd 2001:db8:1::0"}));
+}
+
 TEST_F(CountingWrongTokens, DropsWhatWaitsAtTheEnd) {
     constexpr std::size_t many = 1000;
     fake.whileNoted = [] { std::this_thread::sleep_for(std::chrono::milliseconds(10)); };

@@ -75,6 +75,12 @@ TEST_F(LoginGuard, BansTheNetworkOfACustomer) {
     EXPECT_FALSE(currentBanOf("2001:db8:0:1::99"));
 }
 
+TEST_F(LoginGuard, TellsWhoseFailuresAreCountedTogether) {
+    EXPECT_EQ(sourceOfLogin("192.0.2.1"), "192.0.2.1");
+    EXPECT_EQ(sourceOfLogin("2001:db8::1"), "2001:db8::/64");
+    EXPECT_EQ(sourceOfLogin("nonsense"), "");
+}
+
 TEST_F(LoginGuard, SparesLoopbackAndWhomTheSettingsName) {
     for (const char* address :
          {"127.0.0.1", "127.0.0.2", "::1", "::ffff:127.0.0.1", "198.51.100.9", "nonsense"}) {
