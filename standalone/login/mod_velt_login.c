@@ -12,6 +12,7 @@
 #include "privs.h"
 
 #include "standalone/login/access_files.h"
+#include "standalone/login/admission.h"
 #include "standalone/login/file_functions.h"
 #include "standalone/login/login_program.h"
 #include "standalone/login/main_process.h"
@@ -150,7 +151,9 @@ static void on_authenticated(const void* data, void* ignored) {
     const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
     if (!make_view(c != NULL ? c->argv[0] : "/", FALSE)) {
         *code = PR_AUTH_DISABLEDPWD;
+        return;
     }
+    velt_note_login();
 }
 
 /* The session is about to enter its root directory. */
@@ -167,6 +170,7 @@ static void on_chroot(const void* root, void* ignored) {
         pr_response_send(R_530, "Login incorrect.");
         pr_session_end(0);
     }
+    velt_note_login();
     velt_keep_root();
 }
 
@@ -230,6 +234,7 @@ static int velt_sess_init(void) {
     if (files == NULL) {
         return -1;
     }
+    velt_admit();
     velt_replace_file_functions(files);
     /* The daemon's port may be shared with its successor; the ports of data connections are a session's own.
      */
@@ -243,6 +248,7 @@ static int velt_sess_init(void) {
 
 static conftable velt_conftab[] = {
     {"VeltLoginView", set_velt_login_view, NULL},
+    {"VeltSpared", velt_set_spared, NULL},
     {NULL, NULL, NULL},
 };
 

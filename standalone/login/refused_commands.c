@@ -1,5 +1,6 @@
 #include "standalone/login/refused_commands.h"
 
+#include "standalone/login/client_address.h"
 #include "standalone/login/data_address.h"
 #include "standalone/login/place.h"
 
@@ -47,16 +48,9 @@ MODRET refuse_name(cmd_rec* cmd) {
 }
 
 static int is_same(const struct in6_addr* address, const pr_netaddr_t* other) {
-    const void* number = pr_netaddr_get_inaddr(other);
+    struct in6_addr known;
 
-    if (number == NULL) {
-        return FALSE;
-    }
-    if (pr_netaddr_get_family(other) == AF_INET6) {
-        return memcmp(address, number, sizeof(*address)) == 0;
-    }
-    return IN6_IS_ADDR_V4MAPPED(address) &&
-           memcmp(address->s6_addr + 12, number, sizeof(struct in_addr)) == 0;
+    return velt_read_address(other, &known) && IN6_ARE_ADDR_EQUAL(address, &known);
 }
 
 /* Under which this server is known outside, if that is another than its own. */

@@ -133,7 +133,7 @@ void renderTls(Text& text, const FtpSettings& settings, const ProftpdPlaces& pla
     }
 }
 
-void renderLimits(Text& text, const FtpSettings& settings) {
+void renderLimits(Text& text, const FtpSettings& settings, const ProftpdPlaces& places) {
     const auto& record = settings.record;
     text.line("TimeoutIdle", settings.timeout);
     // Its default of five minutes would end sessions before a longer idle time does.
@@ -147,6 +147,9 @@ void renderLimits(Text& text, const FtpSettings& settings) {
     }
     if (record.max_conn_per_ip > 0) {
         text.line("MaxConnectionsPerHost", record.max_conn_per_ip);
+    }
+    for (const IpNetwork& network : places.spared) {
+        text.line("VeltSpared", toText(network));
     }
 }
 
@@ -228,7 +231,7 @@ std::string renderProftpd(const FtpSettings& settings, const ProftpdPlaces& plac
     renderServer(text, places);
     renderAddresses(text, settings, places);
     renderTls(text, settings, places);
-    renderLimits(text, settings);
+    renderLimits(text, settings, places);
     renderNames(text, settings);
     renderFiles(text, settings);
     renderLogin(text, settings, places);

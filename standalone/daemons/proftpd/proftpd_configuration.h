@@ -2,11 +2,13 @@
 #ifndef VELT_STANDALONE_DAEMONS_PROFTPD_PROFTPD_CONFIGURATION_H
 #define VELT_STANDALONE_DAEMONS_PROFTPD_PROFTPD_CONFIGURATION_H
 
+#include "base/ip_network.h"
 #include "standalone/settings/settings.h"
 
 #include <filesystem>
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace velt {
 
@@ -37,6 +39,7 @@ struct ProftpdPlaces {
     bool ipv6 = true;
     bool loopbackOnly = false;                ///< clients of this machine only, over IPv4
     std::optional<AccountFiles> accountFiles; ///< absent: the server's users, through PAM
+    std::vector<IpNetwork> spared;            ///< may have any number of connections that are not logged in
 };
 
 /// The whole configuration. The settings have passed checkFtpSettings, the places isRenderable. A pure

@@ -2,6 +2,7 @@
 
 #include "base/unique_fd.h"
 #include "standalone/accounts/user_directory.h"
+#include "standalone/bans/ban_settings.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/installed_files.h"
 #include "standalone/core/paths.h"
@@ -104,6 +105,10 @@ Result<ProftpdPlaces> ownPlaces() {
     VELT_RETURN_IF_ERROR(checkRenderable(places.loginProgram, places.moduleFolder));
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
     places.loopbackOnly = network.loopbackOnly;
+    // Without a readable file nobody is banned by mistake either: the service starts, and spares nobody.
+    if (auto bans = loadBanSettings()) {
+        places.spared = std::move(bans->never);
+    }
     return places;
 }
 

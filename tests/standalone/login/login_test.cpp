@@ -12,12 +12,14 @@
 
 extern "C" {
 #include "standalone/login/login_program.h"
+#include "standalone/login/stranger.h"
 #include "tests/standalone/login/stand_in_daemon.h"
 }
 
 #include <array>
 #include <cerrno>
 #include <chrono>
+#include <vector>
 
 namespace velt::test {
 namespace {
@@ -111,6 +113,79 @@ TEST_F(LoginModule, movesNothingAfterAChangeOfTheRules) {
     EXPECT_STREQ(logged(), "session of 'alice' ended: the shares or rules have changed since its login");
     EXPECT_TRUE(std::filesystem::exists(to));
     EXPECT_EQ(rights_taken(), 0);
+}
+
+class Strangers : public LoginModule {
+protected:
+    void SetUp() override {
+        LoginModule::SetUp();
+        comeFrom("192.0.2.7");
+    }
+    void TearDown() override { connect_from(nullptr, nullptr, nullptr); }
+
+    void comeFrom(const char* address, const char* spared = nullptr) const {
+        connect_from(address, board_.c_str(), spared);
+    }
+    bool isSentAway() {
+        const login_world world{program_.c_str(), folder_.path().c_str(), 1, 1, 0, home_.c_str()};
+        return is_sent_away(&world) != 0;
+    }
+    /// Whether one more could come from there.
+    bool hasRoom() {
+        const UniqueFd place(velt_count_stranger(file_.c_str(), &address_));
+        return static_cast<bool>(place);
+    }
+    /// All places of 192.0.2.7 but so many.
+    std::vector<UniqueFd> takeAllBut(int left) {
+        std::vector<UniqueFd> places;
+        for (int i = left; i < velt_most_strangers; i++) {
+            EXPECT_TRUE(places.emplace_back(velt_count_stranger(file_.c_str(), &address_)));
+        }
+        return places;
+    }
+
+    const std::string board_ = folder_.path() / "board";
+    const std::string file_ = board_ + ".strangers";
+    const std::string program_ = script("exit 0\n");
+    in6_addr address_{{{0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0xff, 0xff, 192, 0, 2, 7}}};
+};
+
+TEST_F(Strangers, countUntilTheyHaveLoggedIn) {
+    const auto others = takeAllBut(1);
+    EXPECT_FALSE(isSentAway());
+    EXPECT_FALSE(hasRoom()) << "that one counts";
+    connect_from(nullptr, nullptr, nullptr);
+    EXPECT_EQ(logIn(program_, true, true, -1), login_wrong);
+    EXPECT_FALSE(hasRoom()) << "after a wrong password, too";
+    EXPECT_EQ(logIn(program_), login_granted);
+    EXPECT_TRUE(hasRoom());
+}
+
+TEST_F(Strangers, areSentAwayWhenTheyAreTooMany) {
+    const auto others = takeAllBut(0);
+    EXPECT_TRUE(isSentAway());
+    EXPECT_STREQ(logged(), "refused a connection from 192.0.2.7: 100 of this address are not logged in");
+    EXPECT_EQ(rights_taken(), 0);
+    comeFrom("192.0.2.7", "192.0.2.0/24");
+    EXPECT_FALSE(isSentAway()) << "spared";
+    comeFrom("192.0.2.7", "192.0.3.0/24");
+    EXPECT_TRUE(isSentAway());
+}
+
+TEST_F(Strangers, areServedWhereTheyCannotBeCounted) {
+    connect_from("192.0.2.7", "/proc/none/board", nullptr);
+    EXPECT_FALSE(isSentAway());
+    EXPECT_NE(std::string(logged()).find("cannot be counted: "), std::string::npos) << logged();
+    const std::string path(5000, 'x');
+    connect_from("192.0.2.7", path.c_str(), nullptr);
+    EXPECT_FALSE(isSentAway());
+}
+
+TEST_F(Strangers, ofLoopbackAreAsManyAsTheyLike) {
+    address_ = {{{0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0xff, 0xff, 127, 0, 0, 9}}};
+    const auto others = takeAllBut(0);
+    comeFrom("127.0.0.9");
+    EXPECT_FALSE(isSentAway());
 }
 
 TEST_F(LoginModule, doesNothingForAWrongPassword) {

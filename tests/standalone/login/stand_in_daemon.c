@@ -18,6 +18,10 @@ static listener on_root;
 static int ended;
 static int rights;
 static pr_fs_t files;
+static const char* client;
+static const char* sessions_file;
+static const char* spared_network;
+static int sent_away;
 static char log_text[2048];
 static char memory[65536];
 static size_t used;
@@ -99,10 +103,18 @@ int pr_auth_getgroups(pool* p, const char* name, array_header** ids, array_heade
 
 config_rec* find_config(xaset_t* set, int type, const char* name, int recurse) {
     static void* arguments[3];
+    static void* networks[1];
     static config_rec found;
+    static config_rec spared;
     (void)set;
     (void)type;
     (void)recurse;
+    networks[0] = (void*)spared_network;
+    spared.argc = 1;
+    spared.argv = networks;
+    if (strcmp(name, "VeltSpared") == 0) {
+        return spared_network != NULL ? &spared : NULL;
+    }
     arguments[0] = (void*)world->program;
     arguments[1] = (void*)world->state_root;
     /* The kind for which the program runs in the namespaces of the test itself. */
@@ -110,6 +122,20 @@ config_rec* find_config(xaset_t* set, int type, const char* name, int recurse) {
     found.argc = 3;
     found.argv = arguments;
     return strcmp(name, "VeltLoginView") == 0 && world->program[0] != '\0' ? &found : NULL;
+}
+
+config_rec* find_config_next(config_rec* previous, config_rec* next, int type, const char* name,
+                             int recurse) {
+    (void)previous;
+    (void)next;
+    (void)type;
+    (void)name;
+    (void)recurse;
+    return NULL;
+}
+
+const char* pr_get_scoreboard(void) {
+    return sessions_file;
 }
 
 config_rec* add_config_param_str(const char* name, unsigned int count, ...) {
@@ -139,8 +165,9 @@ int pr_netaddr_get_family(const pr_netaddr_t* address) {
 }
 
 void* pr_netaddr_get_inaddr(const pr_netaddr_t* address) {
+    static struct in_addr number;
     (void)address;
-    return NULL;
+    return client != NULL && inet_pton(AF_INET, client, &number) == 1 ? &number : NULL;
 }
 
 const char* pr_netaddr_get_ipstr(const pr_netaddr_t* address) {
@@ -202,6 +229,7 @@ pr_fs_t* pr_get_fs(const char* path, int* exact) {
 void pr_response_send(const char* code, const char* format, ...) {
     (void)format;
     ended = strcmp(code, R_530) == 0;
+    sent_away = strcmp(code, R_421) == 0;
 }
 
 void pr_session_end(int flags) {
@@ -211,16 +239,30 @@ void pr_session_end(int flags) {
 static void begin(const struct login_world* login) {
     static server_rec server;
     static conn_t connection;
+    static pr_netaddr_t* address;
 
+    connection.remote_addr = (const pr_netaddr_t*)&address;
     main_server = &server;
     world = login;
     used = 0;
     ended = FALSE;
+    sent_away = FALSE;
     rights = 0;
     log_text[0] = '\0';
     session.c = &connection;
     session.user = "alice";
     (void)velt_login_module.sess_init();
+}
+
+void connect_from(const char* address, const char* scoreboard, const char* spared) {
+    client = address;
+    sessions_file = scoreboard;
+    spared_network = spared;
+}
+
+int is_sent_away(const struct login_world* login) {
+    begin(login);
+    return sent_away;
 }
 
 enum login_end log_in(const struct login_world* login) {

@@ -17,6 +17,13 @@ enum login_end {
     login_disconnected, /* at the change of the root directory */
 };
 
+/* Sessions come from this IPv4 address from now on, and the list of sessions has this name; `spared` is a
+ * network in the configuration, or NULL. Without an address, as at first, nobody is counted. */
+void connect_from(const char* address, const char* scoreboard, const char* spared);
+
+/* Whether a session is ended with 421 as soon as it begins. */
+int is_sent_away(const struct login_world* world);
+
 /* How the login of "alice" (1001, groups 1001 and 2001) ends. */
 enum login_end log_in(const struct login_world* world);
 

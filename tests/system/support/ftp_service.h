@@ -40,6 +40,7 @@ protected:
     /// Stores the record and starts the daemon from its plan, in place of the one that runs.
     void start();
     void stop() { daemon_.stop(); }
+    pid_t daemonPid() const { return daemon_.pid(); }
 
     /// Replaces all rules; each one is "u:1001:/path" or "g:2001:/path".
     static void storeRules(const std::vector<std::string>& rules);

@@ -25,7 +25,7 @@ void enableAnonymous(FtpSettings& settings, bool confined) {
     std::strcpy(settings.record.anonymous_chroot_share, "public");
 }
 
-void everything(FtpSettings& settings, ProftpdPlaces&) {
+void everything(FtpSettings& settings, ProftpdPlaces& places) {
     auto& record = settings.record;
     record.service_flags = VELT_FTP_SERVICE_PLAIN | VELT_FTP_SERVICE_TLS;
     std::strcpy(record.portnum, "2121");
@@ -42,6 +42,7 @@ void everything(FtpSettings& settings, ProftpdPlaces&) {
     settings.fipsOnly = true;
     settings.umask = false;
     settings.ascii = false;
+    places.spared = {*parseIpNetwork("192.0.2.0/24"), *parseIpNetwork("2001:db8::1")};
     enableAnonymous(settings, true);
 }
 
