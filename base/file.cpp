@@ -22,11 +22,18 @@ Result<> syncFolder(const fs::path& folder) {
     return {};
 }
 
-bool isSameFile(int fd, const fs::path& path) {
+/// After so many failures to look at a file that was opened, it counts as impossible.
+constexpr int mostFailures = 10;
+
+/// Nothing, with errno set, when that cannot be told.
+std::optional<bool> isSameFile(int fd, const fs::path& path) {
     struct stat opened {};
     struct stat named {};
-    return ::fstat(fd, &opened) == 0 && ::lstat(path.c_str(), &named) == 0 && opened.st_dev == named.st_dev &&
-           opened.st_ino == named.st_ino;
+    if (::fstat(fd, &opened) != 0)
+        return std::nullopt;
+    if (::lstat(path.c_str(), &named) != 0)
+        return errno == ENOENT ? std::optional(false) : std::nullopt;
+    return opened.st_dev == named.st_dev && opened.st_ino == named.st_ino;
 }
 
 } // namespace
@@ -65,15 +72,18 @@ std::optional<std::string> readAll(int fd) {
 }
 
 UniqueFd openLocked(const fs::path& path, int flags, mode_t mode) {
-    for (;;) {
+    for (int failures = 0;;) {
         UniqueFd fd(::open(path.c_str(), flags | O_CREAT | O_NOFOLLOW | O_CLOEXEC, mode));
         if (!fd)
             return fd;
         while (::flock(fd.get(), LOCK_EX) != 0)
             if (errno != EINTR)
                 return UniqueFd();
-        if (isSameFile(fd.get(), path))
+        const auto same = isSameFile(fd.get(), path);
+        if (same == true)
             return fd;
+        if (!same && ++failures == mostFailures)
+            return UniqueFd();
     }
 }
 

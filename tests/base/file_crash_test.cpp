@@ -7,6 +7,7 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -30,6 +31,13 @@ int callsUntilTrouble = 0;
 bool troubleCame = false;
 std::string troubledCall;
 
+std::string brokenCall; ///< always fails
+
+bool isBroken(const char* call) {
+    errno = EIO;
+    return brokenCall == call;
+}
+
 bool isTroubled(const char* call) {
     if (trouble == Trouble::none || callsUntilTrouble-- != 0)
         return false;
@@ -48,6 +56,8 @@ extern "C" {
 int __real_open(const char* path, int flags, ...);
 int __real_mkdir(const char* path, mode_t mode);
 int __real_flock(int fd, int operation);
+int __real_fstat(int fd, struct stat* status);
+int __real_lstat(const char* path, struct stat* status);
 int __real_ftruncate(int fd, off_t length);
 int __real_fchmod(int fd, mode_t mode);
 ssize_t __real_write(int fd, const void* data, size_t size);
@@ -66,6 +76,12 @@ int __wrap_mkdir(const char* path, mode_t mode) {
 }
 int __wrap_flock(int fd, int operation) {
     return isTroubled("flock") ? -1 : __real_flock(fd, operation);
+}
+int __wrap_fstat(int fd, struct stat* status) {
+    return isBroken("fstat") ? -1 : __real_fstat(fd, status);
+}
+int __wrap_lstat(const char* path, struct stat* status) {
+    return isBroken("lstat") ? -1 : __real_lstat(path, status);
 }
 int __wrap_ftruncate(int fd, off_t length) {
     return isTroubled("ftruncate") ? -1 : __real_ftruncate(fd, length);
@@ -101,7 +117,10 @@ protected:
     test::TemporaryFolder folder_;
     std::filesystem::path file_ = folder_.path() / "folder" / "file";
 
-    void TearDown() override { trouble = Trouble::none; }
+    void TearDown() override {
+        trouble = Trouble::none;
+        brokenCall.clear();
+    }
 
     // Whether the store was killed at its n-th call; false once it has fewer calls.
     bool isKilledAt(int call, Trouble kind) const {
@@ -183,6 +202,18 @@ TEST_F(FileCrash, EachFailedCallIsReportedAndLeavesAWholeFile) {
     }
     EXPECT_EQ(failedCalls,
               (std::set<std::string>{"open", "flock", "ftruncate", "fchmod", "write", "fsync", "rename"}));
+}
+
+TEST_F(FileCrash, WhatCannotBeLookedAtIsNotTriedForEver) {
+    ASSERT_TRUE(replaceFile(file_, oldContents, 0644));
+    for (const char* call : {"fstat", "lstat"}) {
+        brokenCall = call;
+        const auto result = replaceFile(file_, newContents, 0644);
+        brokenCall.clear();
+        EXPECT_NE(test::messageOf(result).find(std::strerror(EIO)), std::string::npos) << call;
+        EXPECT_EQ(readFile(file_), oldContents);
+    }
+    expectStoreCleansUp();
 }
 
 } // namespace
