@@ -9,10 +9,13 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
+#include <csignal>
 #include <optional>
 #include <string_view>
+#include <thread>
 #include <vector>
 
 namespace velt {
@@ -20,21 +23,38 @@ namespace {
 
 constexpr int reportDescriptor = 3;
 
+using Clock = std::chrono::steady_clock;
+
+/// Whether the process has ended by then; else it is killed. Nothing here can fail, so that no program is
+/// taken for one that hangs.
+bool endsInTime(pid_t pid, Clock::time_point deadline) {
+    auto pause = std::chrono::microseconds(100);
+    int status = 0;
+    while (::waitpid(pid, &status, WNOHANG) == 0) {
+        if (Clock::now() >= deadline) {
+            ::kill(pid, SIGKILL);
+            while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
+            }
+            return false;
+        }
+        std::this_thread::sleep_for(pause);
+        pause = std::min(pause * 2, std::chrono::microseconds(5000));
+    }
+    return true;
+}
+
 /// Starts the program with `report` as its descriptor 3 and waits for its end, which comes at once: it goes
-/// on in a child of its own.
-Result<> spawnDetached(const std::vector<std::string>& arguments, int report) {
+/// on in a child of its own. False when it does not come.
+Result<bool> spawnDetached(const std::vector<std::string>& arguments, int report,
+                           Clock::time_point deadline) {
     Spawn program;
     program.pass(report, reportDescriptor);
     VELT_ASSIGN_OR_RETURN(const auto pid, program.start(arguments));
-    int status = 0;
-    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
-    }
-    return {};
+    return endsInTime(pid, deadline);
 }
 
 /// What comes out of the pipe until its end; nothing when that does not come within the limit.
-std::optional<std::string> readReport(int descriptor) {
-    const auto deadline = std::chrono::steady_clock::now() + startLimit;
+std::optional<std::string> readReport(int descriptor, Clock::time_point deadline) {
     std::string report;
     std::array<char, 4096> buffer{};
     while (waitForInput(descriptor, deadline)) {
@@ -55,9 +75,10 @@ Result<> ChildLauncher::launch(const std::filesystem::path& folder, const Daemon
         installedFile("velt-supervise").string(), folder.string(), daemon_, order.configurationHash,
         std::string(order.sharesPorts ? sharedPortsPrefix : "") + joinPorts(order.ports, ",")};
     arguments.insert(arguments.end(), order.arguments.begin(), order.arguments.end());
-    VELT_RETURN_IF_ERROR(spawnDetached(arguments, pipe.writeEnd.get()));
+    const auto deadline = Clock::now() + startLimit;
+    VELT_ASSIGN_OR_RETURN(const bool detached, spawnDetached(arguments, pipe.writeEnd.get(), deadline));
     pipe.writeEnd.reset();
-    const auto report = readReport(pipe.readEnd.get());
+    const auto report = detached ? readReport(pipe.readEnd.get(), deadline) : std::nullopt;
     constexpr std::string_view failure = "failed ";
     if (!report) {
         return Error("its supervisor did not report in time");

@@ -127,9 +127,17 @@ TEST_F(SupervisorTest, ASupervisorThatDoesNotReportIsToldFromOneThatEnded) {
     useScript("exit 0");
     std::string refusal = messageOf(sftp_.start(testOrder(port_, "one")));
     EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor ended without giving a reason.");
-    useScript("sleep 5.5 &");
-    refusal = messageOf(sftp_.start(testOrder(port_, "one")));
-    EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor did not report in time.");
+    for (const char* line : {"sleep 5.5 &", "echo $$ >hanging; exec sleep 60"}) {
+        useScript("cd " + root_.string() + "; " + line);
+        const auto began = Clock::now();
+        refusal = messageOf(sftp_.start(testOrder(port_, "one")));
+        EXPECT_EQ(refusal, "The SFTP daemon does not start: its supervisor did not report in time.") << line;
+        EXPECT_LT(Clock::now() - began, seconds(30)) << line;
+    }
+    pid_t hanging = 0;
+    std::ifstream(root_ / "hanging") >> hanging;
+    ASSERT_GT(hanging, 0);
+    EXPECT_EQ(::kill(hanging, 0), -1) << "it was left behind";
     ::setenv("VELT_LIBEXEC_DIR", built.c_str(), 1);
 }
 
