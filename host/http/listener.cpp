@@ -162,11 +162,9 @@ bool giveAsMember(const std::filesystem::path& path, gid_t group) {
     return given;
 }
 
-void giveToGroup(const std::filesystem::path& path, const std::string& name) {
-    const auto group = groupNamed(name);
-    const bool given = !group || giveAsMember(path, *group);
+void giveToGroup(const std::filesystem::path& path, const std::string& name, gid_t group) {
     // A user outside the group cannot give it the socket. Such a user runs a host for personal use.
-    if (!given && (errno != EPERM || geteuid() == 0)) {
+    if (!giveAsMember(path, group) && (errno != EPERM || geteuid() == 0)) {
         throw ListenError(cannot("give", path.string() + " to the group " + name).message);
     }
 }
@@ -233,11 +231,24 @@ Listener Listener::unixSocket(const std::filesystem::path& path, const std::stri
         throw ListenError(cannot("listen on", path, reason).message);
     }
     listener.path_ = path;
-    giveToGroup(path, group);
+    listener.group_ = group;
+    listener.shareWithGroup();
     if (listen(listener.descriptor(), backlog) != 0) {
         throw ListenError(cannot("listen on", path).message);
     }
     return listener;
+}
+
+bool Listener::shareWithGroup() {
+    if (group_.empty()) {
+        return true;
+    }
+    const auto group = groupNamed(group_);
+    if (group) {
+        giveToGroup(path_, group_, *group);
+        group_.clear();
+    }
+    return group.has_value();
 }
 
 std::vector<Listener> Listener::inherited(bool allowRemote) {

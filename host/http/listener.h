@@ -25,8 +25,8 @@ public:
     /// one. Addresses other than loopback need `allowRemote`. Throws ListenError.
     static Listener tcp(const std::string& address, bool allowRemote);
 
-    /// Listens on a Unix socket that its owner and the group (if it exists) can connect to. Replaces the
-    /// socket of a dead host, not that of a live one. Throws ListenError.
+    /// Listens on a Unix socket that its owner can connect to, and the group once it could be looked up.
+    /// Replaces the socket of a dead host, not that of a live one. Throws ListenError.
     static Listener unixSocket(const std::filesystem::path& path, const std::string& group);
 
     /// The sockets that the service manager passed by socket activation, usually none. `allowRemote` is as
@@ -37,6 +37,10 @@ public:
     Listener& operator=(Listener&&) = delete;
     Listener(const Listener&) = delete;
     ~Listener();
+
+    /// False where nobody of the group can connect yet, since there is none or it cannot be looked up: to be
+    /// called again then. Throws ListenError.
+    bool shareWithGroup();
 
     int descriptor() const { return descriptor_.get(); }
     bool isUnixSocket() const { return isUnixSocket_; }
@@ -51,6 +55,7 @@ private:
     UniqueFd descriptor_;
     bool isUnixSocket_;
     std::filesystem::path path_; ///< to unlink in the destructor; "" for none
+    std::string group_;          ///< that is still to have it; "" for none
 };
 
 /// What the kernel knows about a connected socket.

@@ -11,6 +11,7 @@
 #include <netinet/tcp.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <functional>
 #include <mutex>
@@ -48,7 +49,8 @@ struct HttpServer::Core {
     };
 
     Core(HttpHandler& theHandler, const HttpLimits& theLimits, const TlsFiles& tls)
-        : shared{theHandler, theLimits}, tlsContext(makeTlsContext(tls)), sweeper(tcp.context) {}
+        : shared{theHandler, theLimits}, tlsContext(makeTlsContext(tls)), sweeper(tcp.context),
+          groupSearch(tcp.context) {}
 
     /// With the lock of the doors, once the threads run.
     void accept(Door& door) {
@@ -116,6 +118,25 @@ struct HttpServer::Core {
         });
     }
 
+    /// A group that cannot be looked up now would stay locked out until the next start.
+    void searchGroupsLater() {
+        groupSearch.expires_after(limits.groupSearch);
+        groupSearch.async_wait([this](const Error& error) {
+            if (!error && !doorsAreShared()) {
+                searchGroupsLater();
+            }
+        });
+    }
+
+    bool doorsAreShared() {
+        try {
+            return std::ranges::all_of(doors,
+                                       [](const auto& door) { return door->listener.shareWithGroup(); });
+        } catch (const ListenError&) {
+            return false;
+        }
+    }
+
     void closeDoors() {
         const std::lock_guard lock(doorMutex);
         stopping = true;
@@ -146,6 +167,7 @@ struct HttpServer::Core {
     std::vector<std::unique_ptr<Door>> doors;
     bool stopping = false;
     Timer sweeper;
+    Timer groupSearch;
     std::vector<std::thread> threads;
 };
 
@@ -163,6 +185,7 @@ void HttpServer::add(Listener listener) {
 
 void HttpServer::start(unsigned threads) {
     core_->sweep();
+    core_->searchGroupsLater();
     for (const auto& door : core_->doors) {
         core_->accept(*door);
     }

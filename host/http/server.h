@@ -29,6 +29,7 @@ struct HttpLimits {
     std::chrono::milliseconds refusalDelay{1'000}; ///< of the answer to a failed attempt
     std::chrono::milliseconds heartbeat{15'000};   ///< of a stream of events
     std::chrono::milliseconds sweep{1'000};        ///< how often deadlines are checked
+    std::chrono::milliseconds groupSearch{10'000}; ///< for the group of a Unix socket that was not found
 };
 
 struct TlsFiles {

@@ -1,11 +1,16 @@
 // Where the host listens: addresses, Unix sockets, and sockets that are handed over.
 
 #include "host/http/listener.h"
+
+#include "base/unique_fd.h"
+#include "host/base/account_names.h"
 #include "tests/host/host_test.h"
 #include "tests/support/waiting.h"
 
 #include <fcntl.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -13,6 +18,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <functional>
+#include <optional>
 #include <thread>
 #include <vector>
 
@@ -37,6 +43,45 @@ TEST(Listening, APortInUseIsAnError) {
 }
 
 class Doors : public HostTest {};
+
+/// As long as it lives, this process can open so many files more.
+class FilesLeft {
+public:
+    explicit FilesLeft(rlim_t count) {
+        getrlimit(RLIMIT_NOFILE, &former_);
+        const velt::UniqueFd next(open("/dev/null", O_RDONLY | O_CLOEXEC));
+        const rlimit few{static_cast<rlim_t>(next.get()) + count, former_.rlim_max};
+        setrlimit(RLIMIT_NOFILE, &few);
+    }
+    ~FilesLeft() { setrlimit(RLIMIT_NOFILE, &former_); }
+    FilesLeft(const FilesLeft&) = delete;
+    FilesLeft& operator=(const FilesLeft&) = delete;
+
+private:
+    rlimit former_{};
+};
+
+TEST_F(Doors, OpenToAGroupThatCouldNotBeLookedUpAtFirst) {
+    using velt::host::Listener;
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root can give a socket to any group";
+    }
+    const std::string path = (folder / "shared").string();
+    const auto groupOfSocket = [&path] {
+        struct stat status {};
+        return stat(path.c_str(), &status) == 0 ? velt::host::groupName(status.st_gid) : "no socket";
+    };
+    limits.groupSearch = std::chrono::milliseconds(10);
+    start();
+    velt::host::HttpServer other(*app, limits, {});
+    std::optional<FilesLeft> few(std::in_place, 1); // for the socket
+    Listener listener = Listener::unixSocket(path, "daemon");
+    few.reset();
+    EXPECT_EQ(groupOfSocket(), "root");
+    other.add(std::move(listener));
+    other.start(1);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return groupOfSocket() == "daemon"; }, velt::test::patience));
+}
 
 TEST_F(Doors, CloseWhileClientsConnect) {
     for (int i = 0; i < 10; ++i) {
