@@ -103,6 +103,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     } else if (*undone) {
         log.write("a change was cut off half-way: the settings are as they were before it");
     }
+    app.begin();
     if (const auto started = velt::startServicesAtBoot(); !started) {
         log.write("some enabled services did not start: " + started.error().message);
     }

@@ -85,6 +85,10 @@ App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
       settings_(table, openApi_, changes_), history_(table, settings_, log),
       order_(settings.workers, settings.maxWaiting, settings.maxWaitingBytes) {
     addRoutes(table);
+}
+
+void App::begin() {
+    history_.settleBegun();
     confirmations_.emplace(history_, order_);
     changes_.onWaiting([this] { confirmations_->wake(); });
 }

@@ -50,6 +50,10 @@ public:
     HttpResponse failure(int status, const std::string& detail) override;
     void addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) override;
 
+    /// Settles what a former process left of its changes, and takes back those that nobody confirms in time.
+    /// Called once, after what was left half-way was undone and before requests come.
+    void begin();
+
     /// Finishes the accepted requests and accepts no more.
     void stop();
 

@@ -125,10 +125,10 @@ std::optional<HttpResponse> Changes::preview(SettingsChange& change, const Chang
 
 std::optional<HttpResponse> Changes::commit(SettingsChange& change, const ChangeRequest& request,
                                             ChangeReport& report) {
-    // First: one that waits for its confirmation has to be found again after a crash.
-    if (request.options.confirmWithin && !report.changes.empty()) {
-        const auto recorded = record(request, ChangeState::waiting, report);
-        if (!recorded) {
+    // First: a change must be found again after a crash, and one that waits for its confirmation taken back.
+    if (!report.changes.empty()) {
+        const auto recorded = record(request, ChangeState::begun, report);
+        if (!recorded && request.options.confirmWithin) {
             return failedUnchanged(recorded.error(), request.call.id);
         }
     }
@@ -152,8 +152,7 @@ void Changes::noteFailure(const ChangeOutcome& outcome, const ChangeRequest& req
                           const ChangeReport& report) {
     log_.write(request.call.id, "platform: " + outcome.failure->message);
     if (report.id) {
-        (void)setChangeState(*report.id,
-                             ChangeState::undone); // else it is undone once more, which changes nothing
+        (void)removeChange(*report.id); // else the next start finds that it is not in force
     }
     if (!outcome.undone) {
         revision_.advance();
@@ -183,10 +182,10 @@ void Changes::writeDown(const ChangeRequest& request, ChangeReport& report) {
     if (report.changes.empty()) {
         return;
     }
-    if (!report.id) {
-        if (const auto recorded = record(request, ChangeState::done, report); !recorded) {
-            report.warnings.push_back("The change is not in the history. " + recorded.error().message);
-        }
+    const ChangeState state = request.options.confirmWithin ? ChangeState::waiting : ChangeState::done;
+    const auto recorded = report.id ? setChangeState(*report.id, state) : record(request, state, report);
+    if (!recorded) {
+        report.warnings.push_back("The change is not in the history. " + recorded.error().message);
     }
     if (const auto logged =
             writeAudit({AuditEvent::settingsChanged, {request.way, summaryOf(report.changes), {}, {}}});

@@ -4,14 +4,16 @@
 #include "base/number_text.h"
 #include "base/utc_text.h"
 #include "host/api/audit.h"
+#include "host/api/change_summary.h"
 #include "host/api/problem.h"
 #include "host/api/recorded_change.h"
-#include "host/api/rules_section.h"
 #include "host/api/settings_document.h"
 #include "host/base/json.h"
 #include "host/base/query_text.h"
 #include "host/base/random_text.h"
+#include "host/module/platform_request.h"
 
+#include <algorithm>
 #include <exception>
 #include <optional>
 #include <string_view>
@@ -42,17 +44,6 @@ struct Undoing {
     Json::Value wanted;
     std::vector<FieldError> conflicts;
 };
-
-/// Accounts may have come or gone since the change.
-Json::Value withNamesOfNow(Json::Value field) {
-    const std::string rules(rulesSection);
-    if (field["field"] == "/" + rules) {
-        for (const char* each : {"from", "to"}) {
-            field[each] = withNames(jsonObject({{rules.c_str(), field[each]}}))[rules];
-        }
-    }
-    return field;
-}
 
 Undoing undoing(const ChangeRecord& change, const Json::Value& current) {
     Undoing result{current, {}};
@@ -171,23 +162,59 @@ HttpResponse changedSince(const std::vector<FieldError>& conflicts, const Call& 
 }
 
 /// "/ftp/timeout and /ftp/portnum"
-std::string fieldsIn(const std::vector<FieldError>& conflicts) {
-    std::string fields;
-    for (const FieldError& each : conflicts) {
-        fields += (fields.empty() ? "" : " and ") + each.field;
+std::string joined(const std::vector<std::string>& fields) {
+    std::string text;
+    for (const std::string& each : fields) {
+        text += (text.empty() ? "" : " and ") + each;
     }
-    return fields;
+    return text;
 }
 
-/// What it changed is in force no more; of an undoing, what it undid is in force again.
-Result<> noteUndone(const ChangeRecord& change) {
-    constexpr std::string_view prefix = "undo ";
-    if (change.way.starts_with(prefix)) {
-        if (const auto undone = parseNumber(change.way.substr(prefix.size()))) {
-            (void)setChangeState(*undone, ChangeState::done); // it may be too old for the history
+/// What it changed is in force no more, or again; and the other way round what it undid, and so on.
+Result<> noteInForce(ChangeRecord change, bool inForce) {
+    VELT_RETURN_IF_ERROR(setChangeState(change.id, inForce ? ChangeState::done : ChangeState::undone));
+    while (const std::int64_t undone = undoneBy(change)) {
+        inForce = !inForce;
+        VELT_ASSIGN_OR_RETURN(auto former, changeRecord(undone));
+        if (!former) { // too old for the history
+            break;
         }
+        VELT_RETURN_IF_ERROR(setChangeState(undone, inForce ? ChangeState::done : ChangeState::undone));
+        change = std::move(*former);
     }
-    return setChangeState(change.id, ChangeState::undone);
+    return {};
+}
+
+Result<> noteUndone(const ChangeRecord& change) {
+    return noteInForce(change, false);
+}
+
+/// Newest first; those that came after the change.
+Result<std::vector<ChangeRecord>> changesAfter(std::int64_t id) {
+    std::vector<ChangeRecord> later;
+    ChangeFilter filter;
+    filter.limit = longestPage;
+    for (;;) {
+        VELT_ASSIGN_OR_RETURN(const auto page, queryChanges(filter));
+        for (const ChangeRecord& each : page) {
+            if (each.id <= id) {
+                return later;
+            }
+            later.push_back(each);
+        }
+        if (page.size() < static_cast<std::size_t>(filter.limit)) {
+            return later;
+        }
+        filter.beforeId = page.back().id;
+    }
+}
+
+/// Whether everything is as the change left it.
+bool isInForce(const ChangeRecord& change, Json::Value current) {
+    return std::ranges::all_of(fieldsOf(change), [&](const Json::Value& stored) {
+        const Json::Value field = withNamesOfNow(stored);
+        return placeIn(current, field["field"].asString()) == field["to"];
+    });
 }
 
 } // namespace
@@ -226,6 +253,9 @@ HttpResponse History::undo(const Call& call) {
     const auto* const record = std::get_if<ChangeRecord>(&change);
     if (record == nullptr) {
         return std::get<HttpResponse>(change);
+    }
+    if (record->state == ChangeState::begun) {
+        return problem(409, "The change " + call.path[2] + " is not done.", call.id);
     }
     if (record->state == ChangeState::undone) {
         return problem(409, "The change " + call.path[2] + " is undone already.", call.id);
@@ -284,21 +314,71 @@ bool History::takeBack(const ChangeRecord& change) {
         log_.write(call.id, current.error().message);
         return false;
     }
-    const auto [wanted, conflicts] = undoing(change, *current);
-    const std::string kept = fieldsIn(conflicts);
-    if (conflicts.size() == fieldsOf(change).size()) {
-        const std::string verb = conflicts.size() == 1 ? " was" : " were";
+    const auto later = changesAfter(change.id);
+    if (!later) {
+        log_.write(call.id, later.error().message);
+        return false;
+    }
+    const TakingBack back = takingBack(change, *later, *current);
+    if (back.any) {
+        const HttpResponse response = settings_.store(*current, back.wanted, "undo " + id, {}, call);
+        if (response.status != 200) {
+            log_.write(call.id, "cannot take back the unconfirmed change " + id + ": " + response.body);
+            return false;
+        }
+    }
+    for (const ChangeRecord& each : back.rebased) {
+        if (!setChangeFields(each.id, each.fields)) {
+            return false;
+        }
+    }
+    return noteTakenBack(change, back);
+}
+
+bool History::noteTakenBack(const ChangeRecord& change, const TakingBack& back) {
+    const std::string id = std::to_string(change.id);
+    const std::string kept = joined(back.kept);
+    if (!back.any) {
+        const std::string verb = back.kept.size() == 1 ? " was" : " were";
         const auto logged = writeAudit({AuditEvent::superseded, {id, kept + verb, {}, {}}});
         return logged && setChangeState(change.id, ChangeState::superseded);
-    }
-    const HttpResponse response = settings_.store(*current, wanted, "undo " + id, {}, call);
-    if (response.status != 200) {
-        log_.write(call.id, "cannot take back the unconfirmed change " + id + ": " + response.body);
-        return false;
     }
     const std::string but = kept.empty() ? "" : ", but for " + kept + ", changed again since";
     const auto logged = writeAudit({AuditEvent::takenBack, {id, but, {}, {}}});
     return logged && noteUndone(change);
+}
+
+void History::settleBegun() {
+    ChangeFilter filter;
+    filter.state = ChangeState::begun;
+    const auto begun = queryChanges(filter);
+    if (!begun) {
+        log_.write(begun.error().message);
+        return;
+    }
+    for (const ChangeRecord& change : *begun) {
+        settle(change);
+    }
+}
+
+/// Nothing can have come after it but what the administrator did by hand.
+void History::settle(const ChangeRecord& change) {
+    const std::string id = std::to_string(change.id);
+    const PlatformRequest platform(change.actor, change.address);
+    const auto current = readSettingsDocument(table_, {Role::admin, change.actor, change.address, "", ""});
+    if (!current) {
+        log_.write("what became of the change " + id + " is unknown: " + current.error().message);
+        return;
+    }
+    if (!isInForce(change, *current)) {
+        if (const auto removed = removeChange(change.id); !removed) {
+            log_.write(removed.error().message);
+        }
+        return;
+    }
+    log_.write("the change " + id + " was done when veltd ended");
+    (void)setChangeState(change.id, change.confirmBy ? ChangeState::waiting : ChangeState::done);
+    (void)writeAudit({AuditEvent::settingsChanged, {change.way, summaryOf(changesOf(change)), {}, {}}});
 }
 
 } // namespace velt::host

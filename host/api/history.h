@@ -4,6 +4,7 @@
 
 #include "host/api/all_settings.h"
 #include "host/api/route.h"
+#include "host/api/taking_back.h"
 #include "host/base/host_log.h"
 
 #include <vector>
@@ -23,10 +24,16 @@ public:
     /// To be called as a write. False when one of them could not be taken back.
     bool takeBackUnconfirmed();
 
+    /// Finds out what became of a change that a former process had begun, and had not written down as done.
+    /// To be called before any change is made.
+    void settleBegun();
+
 private:
     HttpResponse undo(const Call& call);
     bool tryToTakeBack(const ChangeRecord& change);
     bool takeBack(const ChangeRecord& change);
+    static bool noteTakenBack(const ChangeRecord& change, const TakingBack& back);
+    void settle(const ChangeRecord& change);
 
     const ModuleTable& table_;
     AllSettings& settings_;

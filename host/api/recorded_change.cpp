@@ -15,6 +15,14 @@ Json::Value fieldsOf(const ChangeRecord& change) {
                : Json::Value(Json::arrayValue);
 }
 
+std::vector<FieldChange> changesOf(const ChangeRecord& change) {
+    std::vector<FieldChange> changes;
+    for (const Json::Value& each : fieldsOf(change)) {
+        changes.push_back({each["field"].asString(), each["from"], each["to"]});
+    }
+    return changes;
+}
+
 Json::Value& placeIn(Json::Value& document, const std::string& pointer) {
     const std::size_t slash = pointer.find('/', 1);
     Json::Value& section = document[pointer.substr(1, slash == std::string::npos ? slash : slash - 1)];

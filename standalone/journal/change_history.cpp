@@ -97,6 +97,18 @@ public:
         return sqlite3_last_insert_rowid(database_.get());
     }
 
+    Result<> update(std::int64_t id, const std::string& fields) {
+        Statement statement;
+        if (statement.prepare(database_.get(), "UPDATE change SET fields = ?2, size = ?3 WHERE id = ?1") !=
+            SQLITE_OK) {
+            return cannotBe("written");
+        }
+        statement.bind(1, id);
+        statement.bind(2, fields);
+        statement.bind(3, static_cast<std::int64_t>(fields.size()));
+        return statement.run() == SQLITE_DONE ? Result<>() : cannotBe("written");
+    }
+
     /// Begins to write, and gives it up again. Others who write just now show that it can be done.
     Result<> tryToWrite() {
         sqlite3_busy_timeout(database_.get(), 0);
@@ -168,7 +180,8 @@ Result<> removeOld(History& history, std::int64_t newest, system_clock::time_poi
 
 std::string changeStateName(ChangeState state) {
     // In the order of ChangeState.
-    constexpr std::array<const char*, 5> names{"done", "waiting", "confirmed", "undone", "superseded"};
+    constexpr std::array<const char*, 6> names{"done",   "waiting",    "confirmed",
+                                               "undone", "superseded", "begun"};
     return names.at(static_cast<std::size_t>(state));
 }
 
@@ -187,6 +200,16 @@ Result<> checkHistoryCanBeWritten() {
 Result<> setChangeState(std::int64_t id, ChangeState state) {
     VELT_ASSIGN_OR_RETURN(auto history, History::open());
     return history.run("UPDATE change SET state = ?2 WHERE id = ?1", {id, static_cast<std::int64_t>(state)});
+}
+
+Result<> setChangeFields(std::int64_t id, const std::string& fields) {
+    VELT_ASSIGN_OR_RETURN(auto history, History::open());
+    return history.update(id, fields);
+}
+
+Result<> removeChange(std::int64_t id) {
+    VELT_ASSIGN_OR_RETURN(auto history, History::open());
+    return history.run("DELETE FROM change WHERE id = ?1", {id});
 }
 
 Result<std::vector<ChangeRecord>> queryChanges(const ChangeFilter& filter) {

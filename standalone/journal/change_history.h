@@ -18,9 +18,10 @@ enum class ChangeState {
     confirmed, ///< done, and was confirmed
     undone,
     superseded, ///< was not confirmed, and all that it changed was changed again since
+    begun,      ///< may be done or not: written down first, so that a crash loses no change that is done
 };
 
-/// "done", "waiting", "confirmed", "undone", "superseded".
+/// "done", "waiting", "confirmed", "undone", "superseded", "begun".
 std::string changeStateName(ChangeState state);
 
 /// An accepted change of the settings.
@@ -56,6 +57,12 @@ Result<> checkHistoryCanBeWritten();
 
 /// What became of the change. No error when it is not kept any more.
 Result<> setChangeState(std::int64_t id, ChangeState state);
+
+/// Gives the change other fields. No error when it is not kept any more.
+Result<> setChangeFields(std::int64_t id, const std::string& fields);
+
+/// Removes a change that was not done. No error when there is none.
+Result<> removeChange(std::int64_t id);
 
 /// Newest first.
 Result<std::vector<ChangeRecord>> queryChanges(const ChangeFilter& filter);

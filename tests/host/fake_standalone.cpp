@@ -289,7 +289,8 @@ Result<> logEvent(int category, int level, unsigned event, const std::array<cons
 }
 
 std::string changeStateName(ChangeState state) {
-    constexpr std::array<const char*, 5> names{"done", "waiting", "confirmed", "undone", "superseded"};
+    constexpr std::array<const char*, 6> names{"done",   "waiting",    "confirmed",
+                                               "undone", "superseded", "begun"};
     return names.at(static_cast<std::size_t>(state));
 }
 
@@ -300,13 +301,37 @@ Result<std::int64_t> recordChange(const ChangeRecord& change) {
         return Error(fake.sentence);
     }
     fake.history.push_back(change);
-    fake.history.back().id = static_cast<std::int64_t>(fake.history.size());
-    return fake.history.back().id;
+    fake.history.back().id = ++fake.lastChange;
+    return fake.lastChange;
 }
 
 Result<> setChangeState(std::int64_t id, ChangeState state) {
     const std::lock_guard lock(mutex);
-    FakeStandalone::instance().history.at(static_cast<std::size_t>(id) - 1).state = state;
+    FakeStandalone& fake = FakeStandalone::instance();
+    const auto found = std::ranges::find(fake.history, id, &ChangeRecord::id);
+    if (found != fake.history.end()) {
+        found->state = state;
+    }
+    return {};
+}
+
+Result<> setChangeFields(std::int64_t id, const std::string& fields) {
+    const std::lock_guard lock(mutex);
+    FakeStandalone& fake = FakeStandalone::instance();
+    const auto found = std::ranges::find(fake.history, id, &ChangeRecord::id);
+    if (found != fake.history.end()) {
+        found->fields = fields;
+    }
+    return {};
+}
+
+Result<> removeChange(std::int64_t id) {
+    const std::lock_guard lock(mutex);
+    FakeStandalone& fake = FakeStandalone::instance();
+    if (fake.keepsRemovedChanges) {
+        return Error(fake.sentence);
+    }
+    std::erase_if(fake.history, [id](const ChangeRecord& each) { return each.id == id; });
     return {};
 }
 
@@ -327,9 +352,8 @@ Result<std::vector<ChangeRecord>> queryChanges(const ChangeFilter& filter) {
 Result<std::optional<ChangeRecord>> changeRecord(std::int64_t id) {
     const std::lock_guard lock(mutex);
     const auto& history = FakeStandalone::instance().history;
-    return id >= 1 && static_cast<std::size_t>(id) <= history.size()
-               ? std::optional(history[static_cast<std::size_t>(id) - 1])
-               : std::nullopt;
+    const auto found = std::ranges::find(history, id, &ChangeRecord::id);
+    return found == history.end() ? std::nullopt : std::optional(*found);
 }
 
 Subscription subscribeEvents(EventSubscriber subscriber) {

@@ -26,6 +26,8 @@ struct FakeStandalone {
     std::vector<std::string> warnings;       ///< of each change that is done
     velt::IntendedPorts intended;            ///< of the last change
     std::vector<velt::ChangeRecord> history; ///< oldest first
+    std::int64_t lastChange = 0;             ///< its id
+    bool keepsRemovedChanges = false;        ///< as if they could not be removed
     std::vector<std::string> askedRestarts;  ///< "SERVICE POLICY" of each that was asked for
     bool restartFails = false;               ///< with `sentence`
     bool historyFails = false;               ///< with `sentence`

@@ -39,6 +39,7 @@ void HostTest::start() {
     port = tcp.port();
     server->add(std::move(tcp));
     server->add(Listener::unixSocket(socketPath, settings.access.adminGroup));
+    app->begin();
     server->start(2);
     admin = "Authorization: Bearer " + makeToken("admin") + "\r\n";
     viewer = "Authorization: Bearer " + makeToken("viewer") + "\r\n";

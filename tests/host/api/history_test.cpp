@@ -161,7 +161,83 @@ TEST_F(HostHistory, AFailedChangeDoesNotWait) {
     access.commitFails = true;
     access.sentence = "No luck.";
     EXPECT_EQ(setTimeOut(600, "?confirm_within=60").status, 500);
-    EXPECT_EQ(access.history[0].state, ChangeState::undone);
+    EXPECT_TRUE(access.history.empty());
+}
+
+TEST_F(HostHistory, UnconfirmedChangesOnEachOtherAreAllTakenBack) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    ASSERT_EQ(setTimeOut(700, "?confirm_within=2").status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/2").json()["state"] == "undone"; },
+                                      velt::test::patience));
+    EXPECT_EQ(timeOut(), 300) << "nobody confirmed 600 either";
+    EXPECT_EQ(get("/api/history/1").json()["state"], "superseded");
+}
+
+TEST_F(HostHistory, OfTwoUnconfirmedChangesTheConfirmedOneStays) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    ASSERT_EQ(setTimeOut(700, "?confirm_within=60").status, 200);
+    ASSERT_EQ(post("/api/history/2/confirm").status, 204);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "superseded"; },
+                                      velt::test::patience));
+    EXPECT_EQ(timeOut(), 700);
+}
+
+TEST_F(HostHistory, WhatSomebodyWantedForGoodStaysAlsoWhenItIsTheSameValue) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    ASSERT_EQ(setTimeOut(700).status, 200);
+    ASSERT_EQ(setTimeOut(600).status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "superseded"; },
+                                      velt::test::patience));
+    EXPECT_EQ(timeOut(), 600);
+}
+
+TEST_F(HostHistory, AChangeThatWasUndoneDoesNotStandInTheWay) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
+    ASSERT_EQ(setTimeOut(700).status, 200);
+    ASSERT_EQ(post("/api/history/2/undo").status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "undone"; },
+                                      velt::test::patience));
+    EXPECT_EQ(timeOut(), 300);
+}
+
+TEST_F(HostHistory, TheStatesFollowEachUndoingOfAnUndoing) {
+    ASSERT_EQ(setTimeOut(600).status, 200);
+    for (const char* id : {"1", "2", "3"}) {
+        ASSERT_EQ(post(std::string("/api/history/") + id + "/undo").status, 200);
+    }
+    EXPECT_EQ(timeOut(), 300);
+    std::string states;
+    for (const velt::ChangeRecord& each : access.history) {
+        states += velt::changeStateName(each.state) + " ";
+    }
+    EXPECT_EQ(states, "undone done undone done ");
+}
+
+TEST_F(HostHistory, AChangeThatACrashCutOffIsSettledAtTheNextStart) {
+    ASSERT_EQ(setTimeOut(600).status, 200);
+    ASSERT_EQ(setTimeOut(700, "?confirm_within=1").status, 200);
+    stop();
+    access.audit.clear();
+    for (velt::ChangeRecord& each : access.history) {
+        each.state = ChangeState::begun;
+    }
+    start();
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/2").json()["state"] == "undone"; },
+                                      velt::test::patience))
+        << "it was done, and nobody has confirmed it";
+    EXPECT_EQ(get("/api/history/1").status, 404) << "it is not in force, so it was not done";
+    EXPECT_TRUE(logged("the change 2 was done when veltd ended"));
+}
+
+TEST_F(HostHistory, AChangeIsWrittenDownBeforeItIsDone) {
+    access.commitFails = true;
+    access.sentence = "No luck.";
+    access.keepsRemovedChanges = true;
+    EXPECT_EQ(setTimeOut(600).status, 500);
+    ASSERT_EQ(access.history.size(), 1U);
+    EXPECT_EQ(access.history[0].state, ChangeState::begun);
+    EXPECT_EQ(post("/api/history/1/undo").status, 409);
+    EXPECT_EQ(post("/api/history/1/confirm").status, 409);
 }
 
 } // namespace
