@@ -2,16 +2,22 @@
 #include "tests/host/fake_standalone.h"
 
 #include <mutex>
+#include <utility>
 
 namespace {
 
-std::mutex mutex; ///< guards the failed logins
+std::mutex mutex; ///< guards the failed logins and the bans
 
 } // namespace
 
 std::vector<std::string> FakeStandalone::noted() const {
     const std::lock_guard lock(mutex);
     return failedLogins;
+}
+
+void FakeStandalone::setBans(std::vector<velt::Ban> theirs) {
+    const std::lock_guard lock(mutex);
+    bans = std::move(theirs);
 }
 
 namespace velt {
@@ -29,11 +35,13 @@ std::string sourceOfLogin(const std::string& address) {
 }
 
 Result<CurrentBans> currentBans() {
+    const std::lock_guard lock(mutex);
     const FakeStandalone& fake = FakeStandalone::instance();
     return fake.bansFail ? Result<CurrentBans>(Error(fake.sentence)) : CurrentBans{fake.bans, true};
 }
 
 std::optional<Ban> currentBanOf(const std::string& address) {
+    const std::lock_guard lock(mutex);
     const auto network = parseIpAddress(address);
     for (const Ban& ban : FakeStandalone::instance().bans) {
         if (network && ban.source.contains(*network)) {
@@ -44,6 +52,7 @@ std::optional<Ban> currentBanOf(const std::string& address) {
 }
 
 Result<bool> liftBan(const std::string& addressOrSource) {
+    const std::lock_guard lock(mutex);
     FakeStandalone& fake = FakeStandalone::instance();
     if (fake.bansFail) {
         return Error(fake.sentence);

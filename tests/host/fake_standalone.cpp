@@ -95,8 +95,8 @@ public:
 
     velt::ChangeOutcome commit(velt::SessionPolicy policy) override {
         FakeStandalone& fake = FakeStandalone::instance();
-        if (fake.commitFails) {
-            return {{}, velt::Error(fake.commitError, fake.sentence), fake.undone};
+        if (auto failed = failure(fake)) {
+            return std::move(*failed);
         }
         committed_ = true;
         const auto& journal = fake::Platform::instance().journal;
@@ -109,6 +109,13 @@ public:
     }
 
 private:
+    static std::optional<velt::ChangeOutcome> failure(const FakeStandalone& fake) {
+        const std::lock_guard lock(mutex);
+        return fake.commitFails ? std::optional(velt::ChangeOutcome{
+                                      {}, velt::Error(fake.commitError, fake.sentence), fake.undone})
+                                : std::nullopt;
+    }
+
     velt::ChangeSteps steps() const { return stepsSince(start_); }
     static int ended(velt::SessionPolicy policy) { return policy == velt::SessionPolicy::keep ? 0 : 3; }
 
@@ -134,6 +141,12 @@ void FakeStandalone::announce(const std::string& service, const std::string& act
 void FakeStandalone::reset() {
     const std::lock_guard lock(mutex);
     *this = {};
+}
+
+void FakeStandalone::failCommits(const std::string& why) {
+    const std::lock_guard lock(mutex);
+    commitFails = true;
+    sentence = why;
 }
 
 void FakeStandalone::damageChange(std::int64_t id) {
@@ -219,6 +232,7 @@ void releaseServiceWatch() {
 }
 
 void clearLastError() {
+    const std::lock_guard lock(mutex);
     request().sentence = FakeStandalone::instance().sentence;
 }
 

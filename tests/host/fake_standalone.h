@@ -20,7 +20,12 @@ struct FakeStandalone {
     velt::PortConflict conflict;                       ///< that is found
     velt::ErrorNumber error = velt::ErrorNumber::none; ///< the kind of the last error
     bool planFails = false;                            ///< with commitError, as commits do
-    bool commitFails = false;                          ///< of the next changes, with `sentence`
+    /// The next changes fail, also those that are under way on another thread.
+    void failCommits(const std::string& why);
+    /// The same for bans.
+    void setBans(std::vector<velt::Ban> theirs);
+
+    bool commitFails = false; ///< of the next changes, with `sentence`
     velt::ErrorNumber commitError = velt::ErrorNumber::daemon;
     bool undone = true;                      ///< what was done of a change that failed
     std::vector<std::string> warnings;       ///< of each change that is done

@@ -118,8 +118,7 @@ TEST_F(HostHistory, WhatWaitedAtTheEndOfVeltdIsTakenBackByTheNext) {
 
 TEST_F(HostHistory, AnUnconfirmedChangeThatCannotBeTakenBackIsNotSaidToBe) {
     ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
-    access.commitFails = true;
-    access.sentence = "No luck.";
+    access.failCommits("No luck.");
     EXPECT_TRUE(velt::test::waitUntil([&] { return logged("cannot take back the unconfirmed change 1: "); },
                                       velt::test::patience));
     EXPECT_EQ(get("/api/history/1").json()["state"], "waiting");

@@ -214,7 +214,7 @@ TEST_F(OpenApiTest, EveryOperationTellsOfRefusalsThatComeBeforeIt) {
         EXPECT_TRUE(each.responses.isMember("503")) << each.path;
     }
     const auto anHour = std::chrono::system_clock::now() + std::chrono::hours(1);
-    FakeStandalone::instance().bans = {{velt::parseIpNetwork("127.0.0.1").value(), anHour, "sftp", 10}};
+    FakeStandalone::instance().setBans({{velt::parseIpNetwork("127.0.0.1").value(), anHour, "sftp", 10}});
     for (const Operation& each : operations()) {
         expectDescribed(each, ask(each.method, each.path, admin).status, 429);
     }
