@@ -9,7 +9,7 @@ namespace velt::host {
 
 namespace {
 
-constexpr std::chrono::seconds fresh{1};
+constexpr std::chrono::seconds longestPause{1};
 constexpr std::chrono::seconds goodForProbes{10};
 constexpr std::chrono::seconds stale{120};
 
@@ -61,9 +61,9 @@ bool HealthMonitor::isOlderThan(std::chrono::seconds age) const {
 
 HealthMonitor::Judgement HealthMonitor::current() {
     std::unique_lock lock(mutex_);
-    const auto oldest = Clock::now() - fresh;
+    const auto called = Clock::now();
     // More than once where the one that was being made had begun too early.
-    while (!ended_ && (!judgement_ || begun_ < oldest)) {
+    while (!ended_ && (!judgement_ || begun_ < called)) {
         const Judgement former = judgement_;
         asked_ = true;
         changed_.notify_all();
@@ -81,21 +81,28 @@ HealthMonitor::Judgement HealthMonitor::latest() {
     return isOlderThan(stale) ? nullptr : judgement_;
 }
 
+void HealthMonitor::judgeOnce(std::unique_lock<std::mutex>& lock) {
+    asked_ = false;
+    lock.unlock();
+    const auto begun = Clock::now();
+    auto judgement = std::make_shared<const Findings>(judgeHealth());
+    lock.lock();
+    judgement_ = std::move(judgement);
+    begun_ = begun;
+    changed_.notify_all();
+}
+
 void HealthMonitor::run() {
     std::unique_lock lock(mutex_);
+    const auto isEnded = [this] { return ended_; };
     for (;;) {
         changed_.wait(lock, [this] { return ended_ || asked_; });
         if (ended_) {
             return;
         }
-        asked_ = false;
-        lock.unlock();
-        const auto begun = Clock::now();
-        auto judgement = std::make_shared<const Findings>(judgeHealth());
-        lock.lock();
-        judgement_ = std::move(judgement);
-        begun_ = begun;
-        changed_.notify_all();
+        judgeOnce(lock);
+        const auto took = Clock::now() - begun_;
+        changed_.wait_for(lock, std::min<Clock::duration>(took, longestPause), isEnded);
     }
 }
 

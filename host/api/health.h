@@ -15,7 +15,9 @@
 
 namespace velt::host {
 
-/// Has the server judged on a thread of its own, and keeps the last judgement. Thread-safe.
+/// Has the server judged on a thread of its own, and keeps the last judgement. Between two of them it pauses
+/// for as long as the former one took, a second at most, so that those who ask and ask leave the machine half
+/// of that thread's time. Thread-safe.
 class HealthMonitor {
 public:
     using Judgement = std::shared_ptr<const Findings>;
@@ -25,7 +27,8 @@ public:
     HealthMonitor(const HealthMonitor&) = delete;
     HealthMonitor& operator=(const HealthMonitor&) = delete;
 
-    /// A judgement that is at most a second old; waits for it, which may take seconds.
+    /// A judgement that was begun after this was called, so that it knows what the caller has mended; waits
+    /// for it, which may take seconds. All who wait when one is begun get the same.
     Judgement current();
 
     /// The last judgement; null when there is none, or none of the last two minutes. Does not wait: when it
@@ -36,6 +39,7 @@ private:
     using Clock = std::chrono::steady_clock;
 
     void run();
+    void judgeOnce(std::unique_lock<std::mutex>& lock);
     bool isOlderThan(std::chrono::seconds age) const;
 
     std::mutex mutex_;
