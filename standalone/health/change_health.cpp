@@ -2,6 +2,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/core/unfinished_change.h"
 #include "standalone/health/checks.h"
+#include "standalone/health/mends.h"
 
 namespace velt {
 
@@ -18,7 +19,7 @@ Findings changeFindings() {
     return {{"change-half-undone", Severity::error, "settings",
              "A change failed and could be taken back only in part: settings and services may be those of "
              "before in one place, and the new ones in another.",
-             "systemctl restart veltd"}};
+             restartOfHost()}};
 }
 
 } // namespace velt

@@ -13,11 +13,23 @@ using TimePoint = std::chrono::system_clock::time_point;
 /// Enabled services that are down or run with former settings, with the reason.
 Findings serviceFindings();
 
-/// Services that run with something else than what is stored. What changes meanwhile is not judged.
+/// Services that run with something else than what is stored, or that could not be started again with it.
+/// What changes meanwhile is not judged.
 Findings settingsInForceFindings();
 
-/// The id of these findings.
+/// The ids of these findings.
 inline constexpr std::string_view settingsNotInForce = "settings-not-in-force";
+inline constexpr std::string_view nextStartFails = "next-start-fails";
+
+/// Files of this system that a service which is on needs, and that are missing or cannot be used.
+Findings programFindings();
+
+/// Files of settings that cannot be read, or have values that no daemon takes. Those of a service that cannot
+/// be read at all are in serviceFindings.
+Findings settingsFileFindings();
+
+/// The share that anonymous users are confined to, where it keeps all of them out.
+Findings anonymousFindings();
 
 /// A change that failed and could not be taken back, or not wholly.
 Findings changeFindings();
@@ -53,6 +65,9 @@ Findings externalAddressFindings();
 
 /// The room that is left below the state root.
 Findings diskFindings();
+
+/// Folders of the state that nobody can write, since their disk is mounted for reading only.
+Findings readOnlyFindings();
 
 /// A clock that is behind the files of this system.
 Findings clockFindings(TimePoint now);

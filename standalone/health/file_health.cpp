@@ -4,6 +4,7 @@
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/health/checks.h"
+#include "standalone/health/mends.h"
 #include "standalone/health/named_accounts.h"
 #include "standalone/rules/rule_store.h"
 #include "standalone/shares/share_file.h"
@@ -67,8 +68,7 @@ void judgeShares(Findings& findings, Mentions& mentions) {
     }
     const auto shares = parseShares(*text);
     if (!shares) {
-        findings.push_back(file.problem("-damaged", shares.error().message,
-                                        "Correct " + quoted(file.path) + ", then run: veltctl doctor"));
+        findings.push_back(file.problem("-damaged", shares.error().message, correct(file.path)));
         return;
     }
     for (const ShareEntry& share : *shares) {
@@ -102,8 +102,7 @@ void judgeRules(Findings& findings, Mentions& mentions) {
     }
     const auto rules = parseRules(*text);
     if (!rules) {
-        findings.push_back(file.problem("-damaged", rules.error().message,
-                                        "Correct " + quoted(file.path) + ", then run: veltctl doctor"));
+        findings.push_back(file.problem("-damaged", rules.error().message, correct(file.path)));
         return;
     }
     for (const ChrootRule& rule : *rules) {

@@ -8,6 +8,7 @@
 #include "standalone/firewall/ruleset_generation.h"
 #include "standalone/firewall/table_reading.h"
 #include "standalone/health/checks.h"
+#include "standalone/health/mends.h"
 #include "standalone/ports/port_range.h"
 #include "standalone/process/run_program.h"
 
@@ -18,14 +19,13 @@ namespace velt {
 namespace {
 
 constexpr std::chrono::seconds nftLimit{3};
-constexpr const char* reload = "systemctl restart veltd";
 
 Finding finding(const char* id, Severity severity, std::string sentence, std::string mend) {
     return {id, severity, "firewall", std::move(sentence), std::move(mend)};
 }
 
 std::string afterEdit(const std::string& edit) {
-    return edit + " in " + statePath(paths::firewallSettings).string() + ", then run: " + reload;
+    return thenRestartHost(edit + " in " + statePath(paths::firewallSettings).string());
 }
 
 bool sameRanges(const std::vector<VELT_FTP_PORT_RANGE>& some,
@@ -48,7 +48,7 @@ Finding damagedSettings(const Error& error) {
                    error.message + (kept ? " The firewall keeps its former rules."
                                          : " No rules of this system are in force: all ports of this server "
                                            "are open that others do not close."),
-                   "Correct the file, then run: " + std::string(reload));
+                   thenRestartHost("Correct the file"));
 }
 
 /// Whether the table does what the settings and the services need.
@@ -60,7 +60,7 @@ Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& ne
                         std::string("The firewall rules of this system are not in force: ") +
                             (drops ? "all ports of this server are open that others do not close."
                                    : "nobody is refused after failed logins."),
-                        reload)};
+                        restartOfHost())};
     }
     std::vector<VELT_FTP_PORT_RANGE> wanted = needs.openPorts;
     if (drops) {
@@ -78,7 +78,7 @@ Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& ne
         finding("firewall-rules-differ", drops || table->drops ? Severity::error : Severity::warning,
                 "The firewall rules in force are not those that the settings ask for, which open the ports " +
                     (ports.empty() ? "of nobody" : ports) + ".",
-                reload)};
+                restartOfHost())};
 }
 
 Findings foreignFindings() {

@@ -17,16 +17,23 @@ Finding failedCheck(const std::exception& error) {
             "veltctl doctor"};
 }
 
-/// A service that does not run with what is stored has a reason, which another finding may tell better.
+/// What follows from something else that may be found.
+bool isConsequence(const Finding& finding) {
+    return finding.id == settingsNotInForce || finding.id == nextStartFails;
+}
+
+/// A service that does not run with what is stored, or could not, has a reason, which another finding may
+/// tell better.
 void dropExplained(Findings& all) {
     std::set<std::string> explained;
     for (const Finding& each : all) {
-        if (each.id != settingsNotInForce && each.severity != Severity::notice) {
+        if (!isConsequence(each) && each.severity != Severity::notice) {
             explained.insert(each.subject);
         }
     }
     std::erase_if(all, [&](const Finding& each) {
-        return each.id == settingsNotInForce && explained.contains(each.subject);
+        return isConsequence(each) && (explained.contains(each.subject) ||
+                                       (each.id == nextStartFails && explained.contains("settings")));
     });
 }
 
@@ -38,16 +45,20 @@ Findings judgeHealth() {
         Check{changeFindings},
         Check{[] { return journalFindings(std::chrono::system_clock::now()); }},
         Check{serviceFindings},
+        Check{programFindings},
+        Check{settingsFileFindings},
         Check{greetingFindings},
         Check{settingsInForceFindings},
         Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},
         Check{fileFindings},
         Check{ruleShareFindings},
+        Check{anonymousFindings},
         Check{firewallFindings},
         Check{passiveRangeFindings},
         Check{externalAddressFindings},
         Check{replacedProgramFindings},
         Check{diskFindings},
+        Check{readOnlyFindings},
         Check{[] { return clockFindings(std::chrono::system_clock::now()); }},
     };
     Findings all;

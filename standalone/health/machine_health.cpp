@@ -2,11 +2,15 @@
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 #include "standalone/health/checks.h"
+#include "standalone/health/mends.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
+#include <unistd.h>
 
 #include <array>
+#include <cerrno>
 #include <cstdint>
 #include <filesystem>
 #include <optional>
@@ -46,13 +50,32 @@ std::optional<TimePoint> writtenAt(const std::filesystem::path& file) {
                : std::nullopt;
 }
 
+/// One file of each folder in which this system keeps its state.
+constexpr std::array stateFiles{paths::ftpSettings, paths::logDatabase, paths::events, paths::loadedRules};
+
 } // namespace
+
+Findings readOnlyFindings() {
+    Findings findings;
+    for (const std::string_view file : stateFiles) {
+        const std::filesystem::path folder = statePath(file).parent_path();
+        if (::faccessat(AT_FDCWD, folder.c_str(), W_OK, AT_EACCESS) == 0 || errno != EROFS) {
+            continue; // what belongs to others is told where it is needed
+        }
+        const std::string word = shellWord(folder.string());
+        findings.push_back({"state-read-only", Severity::error, "host",
+                            "The folder " + folder.string() +
+                                ", where this system keeps its state, is mounted read-only: nothing that "
+                                "belongs there can be stored.",
+                            "mount -o remount,rw \"$(findmnt -n -o TARGET -T " + word + ")\""});
+    }
+    return findings;
+}
 
 Findings diskFindings() {
     Findings findings;
     std::set<unsigned long> seen;
-    for (const std::string_view file :
-         {paths::ftpSettings, paths::logDatabase, paths::events, paths::loadedRules}) {
+    for (const std::string_view file : stateFiles) {
         const std::filesystem::path folder = statePath(file).parent_path();
         struct statvfs disk {};
         if (::statvfs(folder.c_str(), &disk) == 0 && seen.insert(disk.f_fsid).second) {

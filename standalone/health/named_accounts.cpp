@@ -28,46 +28,57 @@ struct WaitingMark {
     WaitingMark& operator=(const WaitingMark&) = delete;
 };
 
-bool isOwnUser(const NamedAccount& account) {
+/// The name of one that the files of this system have, or "" for none.
+std::string ownUser(const NamedAccount& account) {
     const auto users = parsePasswd(readFile(statePath(paths::ftpPasswd)).valueOr(""));
-    return std::ranges::any_of(users, [&](const UserEntry& user) {
+    const auto found = std::ranges::find_if(users, [&](const UserEntry& user) {
         return account.name.empty() ? user.uid == account.id : user.name == account.name;
     });
+    return found == users.end() ? "" : found->name;
 }
 
-bool isOwnGroup(const NamedAccount& account) {
+std::string ownGroup(const NamedAccount& account) {
     const auto groups = parseGroup(readFile(statePath(paths::ftpGroup)).valueOr(""));
-    return std::ranges::any_of(groups, [&](const LocalGroup& group) {
+    const auto found = std::ranges::find_if(groups, [&](const LocalGroup& group) {
         return account.name.empty() ? group.entry.gid == account.id : group.entry.name == account.name;
     });
+    return found == groups.end() ? "" : found->entry.name;
 }
 
-bool isKnown(const NamedAccount& account) {
-    if (account.isUser) {
-        return isOwnUser(account) ||
-               (account.name.empty() ? userById(account.id) : userByName(account.name)).has_value();
+template<class Entry> std::string nameIn(const std::optional<Entry>& entry) {
+    return entry ? entry->name : "";
+}
+
+/// "" for one that no source knows.
+std::string nameOf(const NamedAccount& account) {
+    const std::string own = account.isUser ? ownUser(account) : ownGroup(account);
+    if (!own.empty()) {
+        return own;
     }
-    return isOwnGroup(account) ||
-           (account.name.empty() ? groupById(account.id) : groupByName(account.name)).has_value();
+    if (account.isUser) {
+        return nameIn(account.name.empty() ? userById(account.id) : userByName(account.name));
+    }
+    return nameIn(account.name.empty() ? groupById(account.id) : groupByName(account.name));
 }
 
-} // namespace
+using Accounts = std::vector<NamedAccount>;
 
-std::optional<std::vector<NamedAccount>> unknownAccounts(std::vector<NamedAccount> accounts,
-                                                         std::chrono::milliseconds limit) {
+/// What the work makes of the accounts by asking the sources; nothing when it takes longer than the limit, or
+/// somebody waits for them already.
+std::optional<Accounts> askSources(Accounts accounts, std::chrono::milliseconds limit,
+                                   void (*work)(Accounts&)) {
     if (accounts.empty()) {
-        return std::vector<NamedAccount>();
+        return accounts;
     }
     if (waiting() > 0) {
         return std::nullopt;
     }
-    using Answer = std::vector<NamedAccount>;
-    auto answer = std::make_shared<std::promise<Answer>>();
+    auto answer = std::make_shared<std::promise<Accounts>>();
     auto future = answer->get_future();
     auto mark = std::make_shared<WaitingMark>();
     // A source that hangs cannot be interrupted, only left behind.
-    std::thread([answer, mark = std::move(mark), accounts = std::move(accounts)]() mutable {
-        std::erase_if(accounts, isKnown);
+    std::thread([answer, mark = std::move(mark), accounts = std::move(accounts), work]() mutable {
+        work(accounts);
         mark.reset();
         answer->set_value(std::move(accounts));
     }).detach();
@@ -75,6 +86,24 @@ std::optional<std::vector<NamedAccount>> unknownAccounts(std::vector<NamedAccoun
         return std::nullopt;
     }
     return future.get();
+}
+
+} // namespace
+
+std::optional<std::vector<NamedAccount>> unknownAccounts(std::vector<NamedAccount> accounts,
+                                                         std::chrono::milliseconds limit) {
+    return askSources(std::move(accounts), limit, [](Accounts& all) {
+        std::erase_if(all, [](const NamedAccount& each) { return !nameOf(each).empty(); });
+    });
+}
+
+std::vector<NamedAccount> withNames(std::vector<NamedAccount> accounts, std::chrono::milliseconds limit) {
+    const auto named = askSources(accounts, limit, [](Accounts& all) {
+        for (NamedAccount& each : all) {
+            each.name = nameOf(each);
+        }
+    });
+    return named.value_or(std::move(accounts));
 }
 
 } // namespace velt

@@ -26,6 +26,10 @@ struct NamedAccount {
 std::optional<std::vector<NamedAccount>> unknownAccounts(std::vector<NamedAccount> accounts,
                                                          std::chrono::milliseconds limit);
 
+/// The same accounts with their names, where a source knows them by their numbers; as they were when the
+/// sources take longer than the limit.
+std::vector<NamedAccount> withNames(std::vector<NamedAccount> accounts, std::chrono::milliseconds limit);
+
 } // namespace velt
 
 #endif

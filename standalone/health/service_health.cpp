@@ -6,6 +6,7 @@
 #include "standalone/daemons/tls/certificate.h"
 #include "standalone/health/checks.h"
 #include "standalone/health/greeting.h"
+#include "standalone/health/mends.h"
 #include "standalone/ports/port_probe.h"
 #include "standalone/process/replaced_programs.h"
 
@@ -21,10 +22,6 @@ namespace {
 
 constexpr std::chrono::seconds greetingLimit{3};
 constexpr std::chrono::seconds greetingBelieved{60};
-
-std::string restartOf(const Daemon& daemon) {
-    return "veltctl restart " + std::string(daemon.apiName);
-}
 
 /// What was asked of a service that runs.
 struct Question {
@@ -161,15 +158,27 @@ Finding finding(const ServiceDown& down) {
             mendOf(*daemon)};
 }
 
-/// Whether it runs with something else than what a start now would give it.
-bool followsOther(const Daemon& daemon) {
+/// Something else than what runs would come of a start now, or nothing.
+std::optional<Finding> whatAStartWouldChange(const Daemon& daemon) {
     const auto settings = daemon.settings();
     const DaemonState state = daemonState(daemon);
     if (!settings || !settings->enabled() || !isServing(state) || startFailure(daemon)) {
-        return false;
+        return std::nullopt;
     }
+    const std::string service = "The " + std::string(daemon.label) + " service ";
     const auto hash = daemon.test();
-    return hash && *hash != state.configurationHash;
+    if (!hash) {
+        return Finding{std::string(nextStartFails), Severity::warning, std::string(daemon.apiName),
+                       service + "runs, but could not be started again. " + hash.error().message,
+                       "Mend this, then run: " + restartOf(daemon)};
+    }
+    if (*hash == state.configurationHash) {
+        return std::nullopt;
+    }
+    return Finding{std::string(settingsNotInForce), Severity::warning, std::string(daemon.apiName),
+                   service + "does not run with the settings that are stored, as after an edit of its file "
+                             "by hand.",
+                   restartOf(daemon)};
 }
 
 } // namespace
@@ -186,13 +195,8 @@ Findings settingsInForceFindings() {
     Findings findings;
     const ChangeCount before = changeCount();
     for (const Daemon* daemon : allDaemons()) {
-        if (followsOther(*daemon)) {
-            findings.push_back({std::string(settingsNotInForce), Severity::warning,
-                                std::string(daemon->apiName),
-                                "The " + std::string(daemon->label) +
-                                    " service does not run with the settings that are stored, as after an "
-                                    "edit of its file by hand.",
-                                restartOf(*daemon)});
+        if (auto found = whatAStartWouldChange(*daemon)) {
+            findings.push_back(std::move(*found));
         }
     }
     const ChangeCount after = changeCount(); // what is being changed is not in force yet
@@ -230,7 +234,7 @@ Findings replacedProgramFindings() {
                  restartOf(*daemon) + " --end-sessions");
         }
     }
-    look(::getpid(), "host", "veltd", "systemctl restart veltd");
+    look(::getpid(), "host", "veltd", restartOfHost());
     return findings;
 }
 

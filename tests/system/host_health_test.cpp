@@ -153,7 +153,7 @@ TEST_F(HostHealth, AFirewallThatDoesNotFollowIsFound) {
     EXPECT_TRUE(contains(move.errors, firewallFile + ", line 3")) << move.errors;
     EXPECT_EQ(fetchHome(), "alice");
     std::string found = diagnosis();
-    EXPECT_EQ(found, "firewall-settings-damaged: Correct the file, then run: systemctl restart veltd\n");
+    EXPECT_EQ(found, "firewall-settings-damaged: Correct the file, then restart veltd.\n");
     ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
     EXPECT_NE(diagnosis(), "");
     const std::string words = veltctl({"doctor"}).output;
@@ -163,7 +163,7 @@ TEST_F(HostHealth, AFirewallThatDoesNotFollowIsFound) {
     EXPECT_EQ(diagnosis(), "");
     ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
     found = diagnosis();
-    EXPECT_EQ(found, "firewall-rules-missing: systemctl restart veltd\n");
+    EXPECT_EQ(found, "firewall-rules-missing: Restart veltd.\n");
     mend(found, "firewall-rules-missing");
     ASSERT_EQ(runProcess({"nft", "add table inet other; add chain inet other input { type filter hook input "
                                  "priority 0; policy drop; }; add rule inet other input iif lo accept"})
@@ -184,8 +184,8 @@ TEST_F(HostHealth, RulesThatLockTheAdministratorOutAreNotLoaded) {
     startHost();
     std::string found = diagnosis();
     EXPECT_EQ(found, "firewall-locks-out: Add 2022 to \"ports\" in " + firewallFile +
-                         ", then run: systemctl restart veltd\n"
-                         "firewall-rules-missing: systemctl restart veltd\n");
+                         ", then restart veltd.\n"
+                         "firewall-rules-missing: Restart veltd.\n");
     const ProcessResult move = veltctl({"ftp", "set", "portnum=2131"});
     EXPECT_NE(move.exitCode, 0);
     EXPECT_TRUE(contains(move.errors, "they would close port 2022, by which sshd is reached")) << move.errors;
@@ -227,6 +227,93 @@ TEST_F(HostHealth, FilesThatKeepEverybodyOutAreFound) {
     writeFile(sharesFile, all);
     EXPECT_EQ(fetchHome(), "alice");
     EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, AProgramThatLoginsNeedAndThatCannotBeRunIsFound) {
+    EXPECT_EQ(stopHost(), 0);
+    programFolder = "/mnt/programs";
+    fs::create_directories(programFolder);
+    for (const char* each :
+         {"velt-login-view", "velt-authorized-keys", "velt-supervise", "mod_velt_login.so"}) {
+        fs::copy_file(fs::path(VELT_BUILT_FOLDER) / each, fs::path(programFolder) / each,
+                      fs::copy_options::overwrite_existing);
+    }
+    startHost();
+    done({"ftp", "set", "enable_ftp=on"});
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_EQ(diagnosis(), "");
+    const std::string view = programFolder + "/velt-login-view";
+    ASSERT_EQ(::chmod(view.c_str(), 0644), 0);
+    EXPECT_EQ(fetchHome(), "");
+    std::string found = diagnosis();
+    EXPECT_EQ(found, "program-unusable: chmod 755 " + view + "\n");
+    EXPECT_EQ(veltctl({"doctor"}).exitCode, 8);
+    mend(found, "program-unusable");
+    EXPECT_EQ(fetchHome(), "alice");
+    EXPECT_EQ(diagnosis(), "") << "as it is now";
+    fs::rename(view, view + ".gone");
+    EXPECT_EQ(fetchHome(), "");
+    found = diagnosis();
+    EXPECT_EQ(found, "program-unusable: Install this system again, then run: veltctl doctor\n");
+    fs::rename(view + ".gone", view);
+    EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, SettingsThatNoStartCouldUseAreFoundWhileTheServiceRuns) {
+    done({"ftp", "set", "enable_ftp=on", "timeout=400"});
+    const fs::path file = worldRoot / "etc/velt/ftp.conf";
+    const std::string good = contentsOf(file);
+    std::string bad = good;
+    writeFile(file, bad.replace(good.find("timeout = 400"), 13, "timeout = -4"));
+    EXPECT_EQ(diagnosis(), "settings-refused: Correct " + file.string() + ", then run: veltctl doctor\n");
+    EXPECT_NE(veltctl({"ftp", "set", "maxnumclients=7"}).exitCode, 0);
+    writeFile(file, good);
+    EXPECT_EQ(diagnosis(), "");
+    for (const char* each : {"network.conf", "bans.conf", "known_services.conf"}) {
+        const fs::path other = worldRoot / "etc/velt" / each;
+        const bool isThere = fs::exists(other);
+        const std::string before = isThere ? contentsOf(other) : "";
+        writeFile(other, "junk\n");
+        EXPECT_EQ(diagnosis(),
+                  "settings-damaged: Correct " + other.string() + ", then run: veltctl doctor\n");
+        if (isThere) {
+            writeFile(other, before);
+        } else {
+            fs::remove(other);
+        }
+    }
+    EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, AShareThatKeepsAnonymousUsersOutIsFound) {
+    done({"ftp", "set", "enable_ftp=on"});
+    done({"security", "set", "anonymous=on", "anonymous_chroot=on", "anonymous_chroot_share=public"});
+    EXPECT_EQ(anonymousLogin(), 230);
+    EXPECT_EQ(diagnosis(), "");
+    const std::string all = contentsOf(sharesFile);
+    Json::Value closed = jsonOf(all);
+    std::string folder;
+    for (Json::Value& share : closed["shares"]) {
+        if (share["name"] == "public") {
+            share["users"].removeMember("ftp");
+            folder = share["path"].asString();
+        }
+    }
+    writeFile(sharesFile, textOf(closed));
+    EXPECT_EQ(anonymousLogin(), 530);
+    EXPECT_EQ(diagnosis(), "anonymous-kept-out: Write \"ftp\": \"read\" into the users of the share in " +
+                               sharesFile + ", then run: veltctl doctor\n");
+    writeFile(sharesFile, all);
+    fs::rename(folder, folder + ".away");
+    EXPECT_EQ(anonymousLogin(), 530);
+    const std::string found = diagnosis();
+    EXPECT_EQ(found, "anonymous-kept-out: Put your copy back, or, for an empty one, run: install -d " +
+                         folder + "\n");
+    mend(found, "anonymous-kept-out");
+    EXPECT_EQ(anonymousLogin(), 230);
+    EXPECT_EQ(diagnosis(), "");
+    fs::remove(folder);
+    fs::rename(folder + ".away", folder);
 }
 
 TEST_F(HostHealth, ALogThatIsDamagedIsFoundAndPutAside) {

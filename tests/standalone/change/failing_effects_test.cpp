@@ -78,7 +78,7 @@ protected:
         const Findings found = changeFindings();
         ASSERT_EQ(found.size(), 1U);
         EXPECT_EQ(found.at(0).id, "change-half-undone");
-        EXPECT_EQ(found.at(0).mend, "systemctl restart veltd");
+        EXPECT_EQ(found.at(0).mend, "Restart veltd.");
         // What the next veltd does first.
         EXPECT_EQ(undoUnfinishedChange(), true);
         EXPECT_EQ(messageOf(startEnabledServices()), "");

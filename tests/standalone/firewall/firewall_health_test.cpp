@@ -29,7 +29,7 @@ TEST_F(FirewallHealth, ASlipInTheSettingsIsNamed) {
     const Findings found = firewallFindings();
     EXPECT_EQ(summary(found), "error firewall-settings-damaged");
     EXPECT_NE(found.at(0).sentence.find("firewall.conf, line 3"), std::string::npos) << found.at(0).sentence;
-    EXPECT_EQ(found.at(0).mend, "Correct the file, then run: systemctl restart veltd");
+    EXPECT_EQ(found.at(0).mend, "Correct the file, then restart veltd.");
 }
 
 TEST_F(FirewallHealth, RulesThatAnotherFirewallFlushedAreMissed) {
@@ -39,7 +39,7 @@ TEST_F(FirewallHealth, RulesThatAnotherFirewallFlushedAreMissed) {
     ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
     const Findings found = firewallFindings();
     EXPECT_EQ(summary(found), "error firewall-rules-missing");
-    EXPECT_EQ(found.at(0).mend, "systemctl restart veltd");
+    EXPECT_EQ(found.at(0).mend, "Restart veltd.");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
     EXPECT_EQ(firewallFindings(), Findings());
 }

@@ -76,7 +76,7 @@ TEST_F(FirewallTest, RulesThatLockTheAdministratorOutAreNotLoaded) {
     const Findings found = firewallFindings();
     ASSERT_FALSE(found.empty());
     EXPECT_EQ(found.at(0).id, "firewall-locks-out");
-    EXPECT_EQ(found.at(0).mend, "Add 2022 to \"ports\" in " + file + ", then run: systemctl restart veltd");
+    EXPECT_EQ(found.at(0).mend, "Add 2022 to \"ports\" in " + file + ", then restart veltd.");
     setMode("mode = drop\nforce = 1");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
     EXPECT_FALSE(network_->neighbourReaches(2022));

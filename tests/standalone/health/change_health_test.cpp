@@ -27,7 +27,7 @@ TEST_F(ChangeHealth, ANoteThatNobodyWorksOnIsNamed) {
                          "A change failed and could be taken back only in part: settings and "
                          "services may be those of before in one place, and the new ones in "
                          "another.",
-                         "systemctl restart veltd"}}));
+                         "Restart veltd."}}));
     ASSERT_TRUE(forgetChange());
     EXPECT_EQ(changeFindings(), Findings());
 }

@@ -3,6 +3,7 @@
 #include "tests/standalone/health/health_test.h"
 #include "tests/standalone/support/state_folder.h"
 #include "tests/support/result.h"
+#include "tests/support/run_program.h"
 
 #include <gtest/gtest.h>
 
@@ -97,6 +98,21 @@ TEST_F(SmallDisk, ThatIsFullIsAnError) {
 TEST_F(SmallDisk, WithoutRoomForFilesIsAnError) {
     mountDisk("size=200m,nr_inodes=50");
     EXPECT_EQ(ofThisDisk(), "disk-full");
+}
+
+TEST_F(SmallDisk, ThatIsReadOnlyIsAnError) {
+    mountDisk("size=200m");
+    if (IsSkipped()) {
+        return;
+    }
+    EXPECT_EQ(readOnlyFindings(), Findings());
+    ASSERT_EQ(::mount(nullptr, folder_.c_str(), nullptr, MS_REMOUNT | MS_BIND | MS_RDONLY, nullptr), 0);
+    const Findings found = readOnlyFindings();
+    EXPECT_EQ(summary(found), "error state-read-only");
+    EXPECT_NE(found.at(0).sentence.find("The folder " + folder_.string() + ","), std::string::npos)
+        << found.at(0).sentence;
+    ASSERT_EQ(runProcess({"sh", "-c", found.at(0).mend}).exitCode, 0) << found.at(0).mend;
+    EXPECT_EQ(readOnlyFindings(), Findings());
 }
 
 TEST_F(SmallDisk, ThatIsAlmostFullIsAWarning) {

@@ -33,6 +33,18 @@ TEST_F(ServiceHealth, FormerSettingsAreAWarning) {
     EXPECT_EQ(summary(serviceFindings()), "warning service-former-settings");
 }
 
+TEST_F(ServiceHealth, SettingsThatTheDaemonWouldRefuseAreNamedWhileItRuns) {
+    ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
+    EXPECT_EQ(settingsInForceFindings(), Findings());
+    planDouble().refuse = true;
+    EXPECT_EQ(settingsInForceFindings(),
+              (Findings{{"next-start-fails", Severity::warning, "ftp",
+                         "The FTP service runs, but could not be started again. The configuration was "
+                         "refused.",
+                         "Mend this, then run: veltctl restart ftp"}}));
+    planDouble().refuse = false;
+}
+
 TEST_F(ServiceHealth, AMoveToAPortThatIsBoundAndDoesNotListenIsNamed) {
     ASSERT_EQ(VLIBServicectlStart("ftpd", 0), 0) << lastErrorSentence();
     ftpPort_ = freePort();

@@ -15,7 +15,6 @@
 #include <array>
 #include <csignal>
 #include <sstream>
-#include <thread>
 
 namespace velt::test {
 namespace fs = std::filesystem;
@@ -68,7 +67,6 @@ NamedListener::~NamedListener() {
 }
 
 std::string HealthService::diagnosis() {
-    std::this_thread::sleep_for(std::chrono::milliseconds(1100)); // a judgement is kept for a second
     std::string text;
     const Json::Value health = jsonOf(veltctl({"doctor", "--json"}).output);
     for (const Json::Value& each : health["findings"]) {
@@ -95,7 +93,7 @@ void HealthService::obey(std::string command) {
     if (const auto after = command.rfind("run: "); after != std::string::npos) {
         command.erase(0, after + 5);
     }
-    if (command == "systemctl restart veltd") { // there is no systemd in this world
+    if (command.ends_with("estart veltd.")) { // there is no systemd in this world
         EXPECT_EQ(stopHost(), 0);
         startHost();
         return;

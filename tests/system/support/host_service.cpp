@@ -75,7 +75,8 @@ void HostService::startHost() {
         "--listen",       "127.0.0.1:0",  "--print-ready"};
     words.insert(words.end(), hostArguments.begin(), hostArguments.end());
     host = RunningProgram::start(
-        words, {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LANG=C.UTF-8", "VELT_LIBEXEC_DIR=" + built}, logFile);
+        words, {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LANG=C.UTF-8", "VELT_LIBEXEC_DIR=" + programFolder},
+        logFile);
     const Json::Value ready = jsonOf(host.readUntil("\n"));
     ASSERT_TRUE(ready.isObject()) << hostLog();
     const std::string address = ready["listen"][0].asString();

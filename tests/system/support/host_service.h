@@ -70,6 +70,8 @@ protected:
     static std::string hostLog();
 
     Words hostArguments; ///< of veltd, beside the usual ones
+    /// Where the next veltd has the other programs.
+    std::string programFolder = VELT_BUILT_FOLDER;
     RunningProgram host;
     int tcpPort = 0;
     std::string adminToken;
