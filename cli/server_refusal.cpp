@@ -66,6 +66,9 @@ std::string historyHint(const Json::Value& problem, const std::string& path) {
     return problem.isMember("changed") ? "" : "'veltctl history' tells the state of each change.";
 }
 
+constexpr const char* mendOnServer =
+    "Mend what the server names, then try again. 'veltctl doctor' may know the command.";
+
 std::string conflictHint(const Json::Value& problem, const std::string& path) {
     if (std::string hint = historyHint(problem, path); !hint.empty()) {
         return hint;
@@ -74,7 +77,9 @@ std::string conflictHint(const Json::Value& problem, const std::string& path) {
         return "Choose another share ('veltctl shares' lists them), let the account ftp read this one, or "
                "switch anonymous_chroot off.";
     }
-    return "Choose another port, or free this one.";
+    const bool isPort =
+        problem.isMember("holder") || textAt(problem, "title").find(" is taken") != std::string::npos;
+    return isPort ? "Choose another port, or free this one." : mendOnServer;
 }
 
 // A refusal of the module says whether anything was changed, unless its method only reads.
@@ -93,8 +98,7 @@ std::string failureHint(const Json::Value& problem, const AskedFor& asked) {
 /// What is wrong need not be in what was sent: a certificate may not fit its key.
 std::string refusalHint(const Json::Value& problem) {
     const bool ofServer = problem.isMember("code") && problem["errors"].empty();
-    return ofServer ? "Mend what the server names, then try again. 'veltctl doctor' may know the command."
-                    : "Correct the input and try again.";
+    return ofServer ? mendOnServer : "Correct the input and try again.";
 }
 
 std::string absenceHint(const std::string& path) {

@@ -23,7 +23,7 @@ namespace {
 
 constexpr std::string_view noteSubject = "note of the change";
 
-using FormerStates = std::map<const Daemon*, RunState>;
+using FormerStates = std::map<const Daemon*, DaemonState>;
 
 void keepFirst(Result<>& outcome, Result<> next) {
     if (outcome) {
@@ -34,7 +34,7 @@ void keepFirst(Result<>& outcome, Result<> next) {
 FormerStates statesOf(const std::vector<DaemonRequests::Wish>& wishes) {
     FormerStates states;
     for (const auto& wish : wishes) {
-        states[wish.daemon] = daemonState(*wish.daemon).state;
+        states[wish.daemon] = daemonState(*wish.daemon);
     }
     return states;
 }
@@ -55,14 +55,24 @@ Result<> bringBack(const Daemon& daemon, RunState former) {
     });
 }
 
+/// The one that served before the change serves still, with what it was started with: it is better left alone
+/// than exchanged for another one, which may not start either.
+bool isUntouched(const Daemon& daemon, const DaemonState& former) {
+    const DaemonState now = daemonState(daemon);
+    return former.state == RunState::running && now.state == RunState::running && isAlive(now.daemon) &&
+           now.daemon == former.daemon && now.configurationHash == former.configurationHash;
+}
+
 /// Goes on after a failure, and returns the first.
 Result<> bringBackDaemons(const FormerStates& former) {
     std::vector<const Daemon*> daemons;
     for (const auto& [daemon, state] : former) {
-        daemons.push_back(daemon);
+        if (!isUntouched(*daemon, state)) {
+            daemons.push_back(daemon);
+        }
     }
-    const auto failures =
-        bringDaemons(daemons, [&](const Daemon& daemon) { return bringBack(daemon, former.at(&daemon)); });
+    const auto failures = bringDaemons(
+        daemons, [&](const Daemon& daemon) { return bringBack(daemon, former.at(&daemon).state); });
     return failures.empty() ? Result<>() : Result<>(failures.front().error);
 }
 
@@ -81,6 +91,9 @@ Result<> bringBackFiles(const std::vector<StagedFile>& files) {
     // Without the lock, too: better so than not at all. Not held while daemons start.
     const auto lock = std::optional(StateLock::take());
     for (const StagedFile& file : files) {
+        if (isAsBefore(file)) { // where nothing can be written, nothing was
+            continue;
+        }
         keepFirst(outcome, perform(Effect::store, subjectOf(file), [&] { return restore(file); }));
     }
     return outcome;

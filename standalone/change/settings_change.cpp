@@ -112,18 +112,13 @@ Result<> restoreAll(const std::vector<StagedFile>& files) {
     return {};
 }
 
-bool isRestored(const StagedFile& file) {
-    const auto now = readOptionalFile(placeBelowRoot(file.name));
-    return now && *now == file.before;
-}
-
 /// A change must not begin with settings that are half of another one.
 Result<> settleFormerChange() {
     if (!changeWasLeft()) {
         return {};
     }
     VELT_ASSIGN_OR_RETURN(const auto files, unfinishedChange());
-    if (std::ranges::all_of(files, isRestored)) {
+    if (std::ranges::all_of(files, isAsBefore)) {
         return {};
     }
     VELT_RETURN_IF_ERROR(restoreAll(files));

@@ -78,7 +78,15 @@ Result<> store(const StagedFile& file) {
     return replaceFile(placeBelowRoot(file.name), file.after, file.mode);
 }
 
+bool isAsBefore(const StagedFile& file) {
+    const auto now = readOptionalFile(placeBelowRoot(file.name));
+    return now && *now == file.before;
+}
+
 Result<> restore(const StagedFile& file) {
+    if (isAsBefore(file)) {
+        return {};
+    }
     const auto place = placeBelowRoot(file.name);
     if (file.before) {
         return replaceFile(place, *file.before, file.mode);

@@ -62,7 +62,10 @@ Result<std::filesystem::path> storePath(std::string_view absolutePath);
 /// Writes the file as it is to be at its place, for all to see. To be called when nothing is staged.
 Result<> store(const StagedFile& file);
 
-/// Brings the file back as it was.
+/// Whether the file is as it was; false also when that cannot be told.
+bool isAsBefore(const StagedFile& file);
+
+/// Brings the file back as it was. One that is so already is left alone, where nothing can be written, too.
 Result<> restore(const StagedFile& file);
 
 } // namespace velt

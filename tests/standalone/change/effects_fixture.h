@@ -85,7 +85,7 @@ protected:
         if (static_cast<int>(seen_.size()) == killing_) {
             ::kill(::getpid(), SIGKILL);
         }
-        const bool fails = effect == Effect::firewall && firewallFails_;
+        const bool fails = (effect == Effect::firewall && firewallFails_) || seen_.back() == lasting_;
         if (fails || failing_.contains(static_cast<int>(seen_.size()))) {
             return Error(ErrorNumber::store, refusal);
         }
@@ -188,6 +188,7 @@ protected:
     const std::vector<std::string>& seen() const { return seen_; } ///< the effects since failThe or killAt
 
     bool firewallFails_ = false; ///< each time
+    std::string lasting_;        ///< the effect that does
     SessionPolicy policy_ = SessionPolicy::byChange;
 
 private:

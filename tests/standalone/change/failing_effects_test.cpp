@@ -163,6 +163,39 @@ TEST_F(FailingEffects, FirewallSettingsThatCannotBeUsedAreFoundByThePlan) {
     expectSame(everything(), before);
 }
 
+// A full disk, a folder that cannot be written, a program that is broken: what failed fails again.
+TEST_F(FailingEffects, AFaultThatLastsLeavesAllAsItWas) {
+    Wanted next = much();
+    next.rate = 9;
+    next.sftpPort = little().ftpPort;
+    next.rules.clear();
+    reach(much());
+    reach(next);
+    const std::set<std::string> effects(seen().begin(), seen().end());
+    EXPECT_TRUE(effects.contains("start ftpd") && effects.contains("start sftp"));
+    reach(much());
+    const Everything before = everything();
+    const auto daemons = std::pair(daemonOf("ftpd"), daemonOf("sftp"));
+    for (const std::string& effect : effects) {
+        if (tolerated.contains(effect)) {
+            continue;
+        }
+        const testing::ScopedTrace trace(__FILE__, __LINE__, effect);
+        lasting_ = effect;
+        failThe({});
+        const Attempt made = attempt(next);
+        EXPECT_FALSE(made.done);
+        EXPECT_TRUE(made.undone) << made.failure;
+        EXPECT_EQ(made.failure, refusal);
+        lasting_ = "";
+        expectSame(everything(), before);
+        EXPECT_EQ(changeFindings(), Findings());
+        EXPECT_TRUE(effect != "start ftpd" || daemonOf("ftpd") == daemons.first) << "it served all the time";
+        EXPECT_TRUE(effect != "start sftp" || daemonOf("sftp") == daemons.second);
+        reach(much());
+    }
+}
+
 TEST_F(FailingEffects, AnUndoingThatFailsIsSaidAndMadeUpFor) {
     failEachUndoing(little(), much());
     EXPECT_GE(loud_, 8) << "each file, each daemon";
