@@ -120,6 +120,7 @@ std::optional<HttpResponse> Changes::preview(SettingsChange& change, const Chang
     }
     report.steps = plan->steps;
     report.sessionsEnded = plan->sessionsEnded;
+    report.warnings.insert(report.warnings.end(), plan->warnings.begin(), plan->warnings.end());
     return std::nullopt;
 }
 

@@ -124,6 +124,10 @@ void addStart(const Wish& wish, bool serves, const StagedRequest& request,
         stepOf(StepKind::start, daemon, Effect::start, ends ? SessionPolicy::end : request.policy,
                wish.renew ? renewDaemon : startDaemon);
     step.step = startKind(daemon, serves, wish.renew);
+    if (serves && wish.renew && daemon.canPause) { // on the same port, and it shares none
+        program.push_back({ChangeStep{StepKind::pause, std::string(daemon.apiName)}, {}, 0});
+        step.step->kind = StepKind::start;
+    }
     program.push_back(std::move(step));
     if (ends) {
         addEndOfSessions(daemon, program);

@@ -1,12 +1,12 @@
 #include "standalone/change/run_change.h"
 
+#include "standalone/change/closed_ranges.h"
 #include "standalone/control/bring_daemons.h"
 #include "standalone/control/daemon_control.h"
 #include "standalone/control/service_firewall.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/unfinished_change.h"
-#include "standalone/firewall/firewall_settings.h"
 #include "standalone/firewall/firewall_table.h"
 
 #include <syslog.h>
@@ -106,13 +106,6 @@ bool has(const std::vector<ProgramStep>& program, StepKind kind) {
 
 bool movesPorts(const std::vector<ProgramStep>& program) {
     return has(program, StepKind::openPort) || has(program, StepKind::closePort);
-}
-
-/// Whether a port is closed to everybody as long as our rules do not open it. Settings that cannot be read
-/// tell nothing of the rules in force.
-bool rulesCloseOthers() {
-    const auto firewall = loadFirewallSettings();
-    return !firewall || firewall->mode == FirewallMode::drop;
 }
 
 /// A port that stays closed makes the change one that is not done.

@@ -2,6 +2,7 @@
 
 #include "base/file.h"
 #include "standalone/change/change_program.h"
+#include "standalone/change/closed_ranges.h"
 #include "standalone/change/run_change.h"
 #include "standalone/core/error_number.h"
 #include "standalone/core/paths.h"
@@ -12,6 +13,7 @@
 #include "standalone/settings/settings.h"
 
 #include <algorithm>
+#include <iterator>
 #include <optional>
 #include <utility>
 
@@ -64,6 +66,7 @@ public:
             }
             outcome.sessionsEnded += each.sessionsEnded;
         }
+        outcome.warnings = closedRangeWarnings(request, program);
         return outcome;
     }
 
@@ -74,9 +77,12 @@ public:
             staging_.reset();
             return {{}, checked.error()};
         }
+        auto warnings = closedRangeWarnings(*request, program);
         StateLock lock = std::move(staging_->lock);
         staging_.reset();
-        return runChange(*request, program, std::move(lock));
+        ChangeOutcome outcome = runChange(*request, program, std::move(lock));
+        std::ranges::move(warnings, std::back_inserter(outcome.warnings));
+        return outcome;
     }
 
 private:

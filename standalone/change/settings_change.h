@@ -20,7 +20,7 @@ struct ChangeOutcome {
     std::optional<Error> failure; ///< why it was not done
     bool undone = true;           ///< after a failure: all is as it was before
     int sessionsEnded = 0;
-    std::vector<std::string> warnings{}; ///< of a change that was done: what did not work beside it
+    std::vector<std::string> warnings{}; ///< of one that was done: what did not work beside it, or will not
 };
 
 /// Between begin and its end, what this thread stores through the contract is staged: nobody else sees it,

@@ -40,6 +40,25 @@ TEST_F(HostChange, aTakenPortIsFoundByTheDryRunToo) {
     EXPECT_EQ(real.json["detail"], dry.json["detail"]);
 }
 
+TEST_F(HostChange, aRestartPausesWhatCannotShareItsPort) {
+    done({"ftp", "set", "enable_ftp=on"});
+    done({"sftp", "set", "enable=on", "portnum=2012"});
+    const auto effectsOf = [](const HttpResult& answer) {
+        std::string effects;
+        for (const Json::Value& each : answer.json["effects"]) {
+            effects += each["effect"].asString() + " " + each["subject"].asString() + ", ";
+        }
+        return effects;
+    };
+    const auto plan = [&](const std::string& service) {
+        return effectsOf(curl("/api/restart?dry_run=true&service=" + service, "{}", {"--request", "POST"}));
+    };
+    EXPECT_EQ(plan("ftp"), "hand over ftp, ");
+    EXPECT_EQ(plan("sftp"), "pause sftp, start sftp, ");
+    const HttpResult real = curl("/api/restart", "{}", {"--request", "POST"});
+    EXPECT_EQ(real.json["services"].size(), 2U) << real.body;
+}
+
 TEST_F(HostChange, aCertificateThatCannotBeUsedIsNoFaultOfTheRequest) {
     done({"ftp", "set", "enable_ftps=on"});
     std::filesystem::create_directories(worldRoot / "etc/velt/tls");
