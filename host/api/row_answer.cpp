@@ -41,9 +41,24 @@ bool isOnePort(std::string_view field) {
     return field == "portnum";
 }
 
+const Meaning* knownMeaning(int code) {
+    const auto* const found = std::ranges::find(meanings, code, &Meaning::code);
+    return found == meanings.end() ? nullptr : found;
+}
+
+/// Whether the platform could not tell if the port can be had, which the module takes for a conflict.
+bool isUntold(const Outcome& outcome) {
+    constexpr std::array told{ErrorNumber::none, ErrorNumber::invalid, ErrorNumber::portTaken};
+    const Meaning* const meaning = knownMeaning(outcome.code);
+    const PlatformReport& platform = outcome.platform;
+    return meaning != nullptr && meaning->portTaken && platform.conflict.holder.empty() &&
+           platform.conflict.sentence.empty() && std::ranges::find(told, platform.error) == told.end();
+}
+
 Meaning meaningOf(const Outcome& outcome) {
-    const auto* const found = std::ranges::find(meanings, outcome.code, &Meaning::code);
-    if (found == meanings.end()) { // a failure for which the module has no code of its own
+    const Meaning* const found = knownMeaning(outcome.code);
+    // A failure for which the module has no code of its own.
+    if (found == nullptr || isUntold(outcome)) {
         const FailureKind kind = kindOf(outcome.platform.error);
         return {outcome.code, kind.status, kind.title};
     }
@@ -77,7 +92,7 @@ std::string detailOf(const Row& row, const Outcome& outcome, const Meaning& mean
     } else if (*meaning.field != '\0' && meaning.status == kindOf(ErrorNumber::invalid).status) {
         append(detail, describe({meaning.field, meaning.expected}));
     } else {
-        const std::string reason = reasonIn(outcome.logLines);
+        const std::string reason = isUntold(outcome) ? "" : reasonIn(outcome.logLines);
         // One that ends with places in the platform's sources is for its log.
         const bool isForPeople = !reason.ends_with(']') || outcome.platform.sentence.empty();
         append(detail, isForPeople ? reason : "");

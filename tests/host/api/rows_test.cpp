@@ -167,6 +167,19 @@ TEST_F(HostRows, APortThatNobodyHoldsIsNone) {
               "Nothing was changed.");
 }
 
+TEST_F(HostRows, APortThatCannotBeJudgedIsNotCalledABadOne) {
+    platform.takenPorts["ssh"] = {2191};
+    access.sentence =
+        "Cannot read known_services.conf, line 2: expected a port or a range of ports, and a name.";
+    access.error = velt::ErrorNumber::damaged;
+    const Answer answer = post(ftp + "3/set", R"({"enable_ftp":true,"enable_ftps":true,"portnum":2191})");
+    EXPECT_EQ(answer.status, 500);
+    EXPECT_EQ(answer.json()["title"], "The operation failed");
+    EXPECT_FALSE(answer.json().isMember("errors"));
+    EXPECT_FALSE(answer.json().isMember("holder"));
+    EXPECT_EQ(answer.json()["detail"], access.sentence + " Nothing was changed.");
+}
+
 TEST_F(HostRows, AShareOutOfReachIsAConflict) {
     access.conflict.holder = "what an earlier request of the thread found";
     const Answer answer = post(security + "set", R"({"anonymous_chroot":true,"anonymous_chroot_share":"x"})");
