@@ -5,6 +5,7 @@
 #include "standalone/core/effects.h"
 #include "standalone/daemons/daemon.h"
 #include "standalone/firewall/firewall_table.h"
+#include "standalone/settings/settings.h"
 
 #include <syslog.h>
 
@@ -25,6 +26,8 @@ Result<FirewallNeeds> firewallNeeds() {
         }
     }
     VELT_ASSIGN_OR_RETURN(needs.banned, sourcesToRefuse());
+    // That the file is damaged is for the start of a service to tell: this only words warnings.
+    needs.onlyFromHere = loadNetworkSettings().valueOr({}).loopbackOnly;
     needs.administration = administrationPorts;
     return needs;
 }

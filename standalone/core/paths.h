@@ -39,6 +39,7 @@ inline constexpr std::string_view ftpRun = "/run/velt/ftp";
 inline constexpr std::string_view sftpConfigurations = "/run/velt/sftp/configurations"; ///< a folder
 inline constexpr std::string_view bans = "/run/velt/bans";
 inline constexpr std::string_view loadedRules = "/run/velt/firewall.loaded";
+inline constexpr std::string_view listedRules = "/run/velt/firewall.listed";
 inline constexpr std::string_view firewallWarning = "/run/velt/firewall.warning";
 
 } // namespace velt::paths

@@ -10,7 +10,7 @@
 #include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/rule_script.h"
 #include "standalone/firewall/ruleset.h"
-#include "standalone/process/run_program.h"
+#include "standalone/firewall/table_reading.h"
 
 #include <syslog.h>
 #include <unistd.h>
@@ -32,18 +32,16 @@ std::string firstLine(const std::string& text) {
     return text.substr(0, text.find('\n'));
 }
 
-void warnOfForeignTables() {
-    const auto listed = runProcess({"nft", "--json", "list", "chains"});
-    const std::vector<std::string> chains = foreignDropChains(listed ? listed->output : "");
-    if (chains.empty()) {
+void warnOfForeignTables(const FirewallNeeds& needs) {
+    const auto rules = listRules();
+    std::string text;
+    for (const ClosingChain& each :
+         rules ? closingChains(*rules, needs.openPorts, needs.onlyFromHere) : std::vector<ClosingChain>()) {
+        text += each.sentence() + "\n";
+    }
+    if (text.empty()) {
         ::unlink(warningFile().c_str());
         return;
-    }
-    std::string text;
-    for (const std::string& chain : chains) {
-        text += "The chain \"" + chain +
-                "\" of another firewall drops what it does not accept itself, so ports of the file-transfer "
-                "services may stay closed.\n";
     }
     ::syslog(LOG_WARNING, "%s", firstLine(text).c_str());
     // The rules are in force by now; only the note is missing.
@@ -95,7 +93,8 @@ Result<> replaceRules(const FirewallSettings& firewall, const std::string& scrip
     // Those who are banned are no part of what is compared: they come and go with the rules in force.
     VELT_ASSIGN_OR_RETURN(const auto before, runRuleScript(script + renderBannedSources(needs.banned)));
     noteLoaded(script, before);
-    warnOfForeignTables();
+    noteListing(script, tablePrint(listTable()));
+    warnOfForeignTables(needs);
     return {};
 }
 

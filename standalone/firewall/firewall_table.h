@@ -27,6 +27,7 @@ struct FirewallNeeds {
     std::vector<VELT_FTP_PORT_RANGE> openPorts;  ///< for everybody
     std::vector<VELT_FTP_PORT_RANGE> loginPorts; ///< closed to those who are banned
     std::vector<BannedSource> banned;
+    bool onlyFromHere = false; ///< the services listen on the loopback interface alone
     /// Asked only where rules are to be loaded that close ports; empty: there are none.
     std::function<Result<std::vector<AdministrationPort>>()> administration = {};
 };

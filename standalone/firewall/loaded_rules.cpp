@@ -1,6 +1,7 @@
 #include "standalone/firewall/loaded_rules.h"
 
 #include "base/file.h"
+#include "base/sha256.h"
 #include "base/text.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -29,6 +30,11 @@ std::string networkId() {
 
 std::string note(std::uint32_t generation, std::string_view script) {
     return bootId() + "\n" + networkId() + " " + std::to_string(generation) + "\n" + std::string(script);
+}
+
+/// Stands before what the table of this script looked like in this network.
+std::string listingHead(std::string_view script) {
+    return bootId() + " " + networkId() + " " + sha256(script) + "\n";
 }
 
 } // namespace
@@ -67,8 +73,25 @@ void noteChanged(std::optional<std::uint32_t> before) {
     }
 }
 
+void noteListing(std::string_view script, const std::string& print) {
+    if (print.empty() || !rulesAreInForce(script)) {
+        return;
+    }
+    const std::string text = listingHead(script) + print;
+    if (const auto noted = replaceFile(statePath(paths::listedRules), text, 0644); !noted) {
+        ::syslog(LOG_WARNING, "%s", noted.error().message.c_str());
+    }
+}
+
+std::string listingAfterLoading(std::string_view script) {
+    const auto text = readFile(statePath(paths::listedRules));
+    const std::string head = listingHead(script);
+    return text && text->starts_with(head) ? text->substr(head.size()) : "";
+}
+
 void noteRemoved() {
     ::unlink(noteFile().c_str());
+    ::unlink(statePath(paths::listedRules).c_str());
 }
 
 } // namespace velt

@@ -7,6 +7,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
 #include <string_view>
 
 namespace velt {
@@ -29,6 +30,13 @@ void noteLoaded(std::string_view script, std::optional<std::uint32_t> before);
 /// Notes that we have changed elements of the rules in force. `before` is the generation before that. When
 /// the rules were not in force then, or somebody else made a change in between, they are not in force now.
 void noteChanged(std::optional<std::uint32_t> before);
+
+/// Notes what our table looked like (a tablePrint) when it had just been loaded by this script, if nobody
+/// has changed any rule since.
+void noteListing(std::string_view script, const std::string& print);
+
+/// That print; "" where it is not known for this script. May be called without the lock.
+std::string listingAfterLoading(std::string_view script);
 
 /// Notes that no rules of ours are loaded.
 void noteRemoved();

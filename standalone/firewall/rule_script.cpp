@@ -15,6 +15,7 @@ namespace velt {
 namespace {
 
 constexpr std::size_t longestReason = 400;
+constexpr std::chrono::seconds listLimit{3};
 
 Error cannotLoad(const std::string& reason) {
     return {ErrorNumber::firewall, "Cannot load the firewall rules: " + reason + "."};
@@ -42,6 +43,12 @@ Result<std::optional<std::uint32_t>> runRuleScript(const std::string& script) {
         reason = "this process is not allowed to change the firewall";
     }
     return cannotLoad(reason);
+}
+
+std::string listTable() {
+    const auto listed =
+        runProcess({"nft", "--json", "list", "table", "inet", "velt_fileserv"}, {}, listLimit);
+    return listed && listed->exitCode == 0 ? listed->output : "";
 }
 
 } // namespace velt

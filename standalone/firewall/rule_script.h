@@ -1,4 +1,4 @@
-// Carrying out a script for the program nft.
+// Carrying out a script for the program nft, and what it has made.
 #ifndef VELT_STANDALONE_FIREWALL_RULE_SCRIPT_H
 #define VELT_STANDALONE_FIREWALL_RULE_SCRIPT_H
 
@@ -17,6 +17,9 @@ Result<bool> mayTouchRules();
 /// Carries the script out, as a whole or not at all. It has to change something. Returns the generation of
 /// the rules before; nothing where it cannot be told.
 Result<std::optional<std::uint32_t>> runRuleScript(const std::string& script);
+
+/// Our table as nft lists it in JSON; "" when there is none, or it cannot be listed.
+std::string listTable();
 
 } // namespace velt
 

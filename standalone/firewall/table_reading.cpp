@@ -1,6 +1,7 @@
 #include "standalone/firewall/table_reading.h"
 
 #include "base/json_text.h"
+#include "base/sha256.h"
 
 #include <algorithm>
 
@@ -22,7 +23,33 @@ bool isNamed(const Json::Value& entry, const char* kind, const char* name) {
     return entry.isObject() && entry[kind].isObject() && entry[kind]["name"] == name;
 }
 
+/// Numbers that the kernel gives to each thing anew.
+void removeHandles(Json::Value& value) {
+    if (value.isObject()) {
+        value.removeMember("handle");
+    }
+    if (value.isObject() || value.isArray()) {
+        for (Json::Value& each : value) {
+            removeHandles(each);
+        }
+    }
+}
+
 } // namespace
+
+std::string tablePrint(std::string_view tableAsJson) {
+    Json::Value root = parseJson(tableAsJson).valueOr({});
+    if (!root.isObject() || !root["nftables"].isArray()) {
+        return "";
+    }
+    for (Json::Value& entry : root["nftables"]) {
+        if (isNamed(entry, "set", "banned4") || isNamed(entry, "set", "banned6")) {
+            entry["set"].removeMember("elem");
+        }
+    }
+    removeHandles(root);
+    return sha256(jsonText(root));
+}
 
 std::optional<TableInForce> readTable(std::string_view tableAsJson) {
     const Json::Value root = parseJson(tableAsJson).valueOr({});

@@ -3,6 +3,7 @@
 #include "standalone/core/state_root.h"
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/loaded_rules.h"
 #include "standalone/firewall/rule_script.h"
 #include "standalone/firewall/ruleset.h"
 #include "standalone/firewall/ruleset_generation.h"
@@ -10,15 +11,12 @@
 #include "standalone/health/checks.h"
 #include "standalone/health/mends.h"
 #include "standalone/ports/port_range.h"
-#include "standalone/process/run_program.h"
 
 #include <algorithm>
 #include <mutex>
 
 namespace velt {
 namespace {
-
-constexpr std::chrono::seconds nftLimit{3};
 
 Finding finding(const char* id, Severity severity, std::string sentence, std::string mend) {
     return {id, severity, "firewall", std::move(sentence), std::move(mend)};
@@ -35,15 +33,9 @@ bool sameRanges(const std::vector<VELT_FTP_PORT_RANGE>& some,
     });
 }
 
-/// The rules that are loaded; nothing when there are none, or they cannot be listed.
-std::optional<TableInForce> listedTable() {
-    const auto listed = runProcess({"nft", "--json", "list", "table", "inet", "velt_fileserv"}, {}, nftLimit);
-    return listed && listed->exitCode == 0 ? readTable(listed->output) : std::nullopt;
-}
-
 /// What cannot be read asks for no rules; those from before are in force as long as nobody removes them.
 Finding damagedSettings(const Error& error) {
-    const bool kept = listedTable().has_value();
+    const bool kept = readTable(listTable()).has_value();
     return finding("firewall-settings-damaged", Severity::error,
                    error.message + (kept ? " The firewall keeps its former rules."
                                          : " No rules of this system are in force: all ports of this server "
@@ -51,10 +43,24 @@ Finding damagedSettings(const Error& error) {
                    thenRestartHost("Correct the file"));
 }
 
+/// What others have done to rules of ours since they were loaded.
+Findings changedRuleFindings(const std::string& listed, const std::string& script) {
+    const std::string loaded = listingAfterLoading(script);
+    if (loaded.empty() || loaded == tablePrint(listed)) {
+        return {};
+    }
+    return {finding("firewall-rules-changed", Severity::error,
+                    "The firewall rules of this system were changed after it had loaded them: ports may be "
+                    "closed, or open to those who are banned.",
+                    restartOfHost())};
+}
+
 /// Whether the table does what the settings and the services need.
-Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& needs) {
+Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& needs,
+                       const std::string& script) {
     const bool drops = settings.mode == FirewallMode::drop;
-    const auto table = listedTable();
+    const std::string listed = listTable();
+    const auto table = readTable(listed);
     if (!table) {
         return {finding("firewall-rules-missing", drops ? Severity::error : Severity::warning,
                         std::string("The firewall rules of this system are not in force: ") +
@@ -68,7 +74,7 @@ Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& ne
     }
     wanted = joinedRanges(std::move(wanted));
     if (table->drops == drops && sameRanges(table->openPorts, wanted)) {
-        return {};
+        return changedRuleFindings(listed, script);
     }
     std::string ports;
     for (const VELT_FTP_PORT_RANGE& range : wanted) {
@@ -81,16 +87,14 @@ Findings tableFindings(const FirewallSettings& settings, const FirewallNeeds& ne
                 restartOfHost())};
 }
 
-Findings foreignFindings() {
-    const auto listed = runProcess({"nft", "--json", "list", "chains"}, {}, nftLimit);
+Findings foreignFindings(const FirewallNeeds& needs) {
     Findings findings;
-    for (const std::string& chain : foreignDropChains(listed ? listed->output : "")) {
-        findings.push_back(
-            finding("firewall-foreign-drop", Severity::warning,
-                    "The chain \"" + chain +
-                        "\" of another firewall drops what it does not accept itself, so ports of "
-                        "the file services may be closed.",
-                    "nft list chain " + chain));
+    const auto rules = listRules();
+    for (const ClosingChain& chain :
+         rules ? closingChains(*rules, needs.openPorts, needs.onlyFromHere) : std::vector<ClosingChain>()) {
+        findings.push_back(finding("firewall-foreign-drop",
+                                   chain.surely ? Severity::error : Severity::warning, chain.sentence(),
+                                   "nft list chain " + chain.name));
     }
     return findings;
 }
@@ -123,12 +127,17 @@ Findings findingsInForce(const FirewallSettings& settings, const FirewallNeeds& 
                          std::uint32_t generation) {
     static Judged judged;
     const std::string script = renderRuleset(settings, needs.openPorts, needs.loginPorts);
+    std::string judgedBy = script;
+    for (const VELT_FTP_PORT_RANGE& range : needs.openPorts) { // of which a script for no table tells nothing
+        judgedBy += formatPortRange(range) + (needs.onlyFromHere ? " here\n" : "\n");
+    }
     const std::lock_guard lock(judged.mutex);
-    if (!judged.findings || judged.generation != generation || judged.script != script) {
-        Findings findings = tableFindings(settings, needs);
-        std::ranges::move(foreignFindings(), std::back_inserter(findings));
+    if (!judged.findings || judged.generation != generation || judged.script != judgedBy) {
+        Findings findings =
+            settings.mode == FirewallMode::off ? Findings() : tableFindings(settings, needs, script);
+        std::ranges::move(foreignFindings(needs), std::back_inserter(findings));
         judged.generation = generation;
-        judged.script = script;
+        judged.script = judgedBy;
         judged.findings = std::move(findings);
     }
     return *judged.findings;
@@ -146,8 +155,8 @@ Findings firewallFindings() {
     }
     const auto generation = rulesetGeneration();
     const auto needs = firewallNeeds();
-    if (settings->mode == FirewallMode::off || !needs || !generation) {
-        return {}; // nothing to be in force, services that tell what is wrong, or no right to look
+    if (!needs || !generation) {
+        return {}; // services that tell what is wrong, or no right to look
     }
     Findings findings = lockOutFindings(*settings, *needs);
     std::ranges::move(findingsInForce(*settings, *needs, *generation), std::back_inserter(findings));

@@ -51,7 +51,7 @@ template<class Entry> std::string nameIn(const std::optional<Entry>& entry) {
 
 /// "" for one that no source knows.
 std::string nameOf(const NamedAccount& account) {
-    const std::string own = account.isUser ? ownUser(account) : ownGroup(account);
+    std::string own = account.isUser ? ownUser(account) : ownGroup(account);
     if (!own.empty()) {
         return own;
     }

@@ -4,6 +4,8 @@
 #include "standalone/core/error_number.h"
 #include "standalone/core/unfinished_change.h"
 #include "standalone/daemons/tls/certificate.h"
+#include "standalone/firewall/foreign_tables.h"
+#include "standalone/firewall/rule_script.h"
 #include "standalone/health/checks.h"
 #include "standalone/health/greeting.h"
 #include "standalone/health/mends.h"
@@ -87,6 +89,11 @@ Finding noGreeting(const Daemon& daemon, int port, const Error& error) {
             restartOf(daemon)};
 }
 
+bool isClosedByFirewall(int port) {
+    const auto rules = mayTouchRules().valueOr(false) ? listRules() : std::nullopt;
+    return rules && closesToThisServer(*rules, port);
+}
+
 Findings tlsFindings(const Daemon& daemon, const Question& question) {
     const auto served = certificateServedAt(question.port, greetingLimit);
     if (!served) {
@@ -113,7 +120,9 @@ Findings greetingFindingsOf(const Daemon& daemon) {
     }
     const auto greeted = awaitGreeting(question->port, service == "sftp" ? "SSH-2.0-" : "220", greetingLimit);
     if (!greeted) {
-        return {noGreeting(daemon, question->port, greeted.error())};
+        return isClosedByFirewall(question->port)
+                   ? Findings() // the rules are at fault, of which the check of the firewall tells
+                   : Findings{noGreeting(daemon, question->port, greeted.error())};
     }
     Findings found = question->tls ? tlsFindings(daemon, *question) : Findings();
     if (found.empty()) {

@@ -16,19 +16,11 @@ namespace {
 
 using std::chrono::seconds;
 
-const std::string firewallFile = worldRoot / "etc/velt/firewall.conf";
 const std::string rulesFile = worldRoot / "etc/velt/chroot_rules";
 const std::string sharesFile = worldRoot / "etc/velt/shares.json";
 
 class HostHealth : public HealthService {
 protected:
-    void TearDown() override {
-        HealthService::TearDown();
-        if (whyNoWorld().empty()) {
-            runProcess({"nft", "flush", "ruleset"});
-        }
-    }
-
     static void signalDaemon(const std::string& name, const std::string& signal) {
         const std::string state = contentsOf(worldRoot / ("run/velt/" + name + ".state"));
         const std::string pid = state.substr(state.find("\ndaemon ") + 8);
@@ -143,58 +135,6 @@ TEST_F(HostHealth, AStartThatFailedAtTheBootIsMadeUpFor) {
     EXPECT_EQ(diagnosis(), "");
 }
 
-TEST_F(HostHealth, AFirewallThatDoesNotFollowIsFound) {
-    setFirewall("mode = drop\nports = 22\n");
-    done({"ftp", "set", "enable_ftp=on"});
-    EXPECT_EQ(diagnosis(), "");
-    setFirewall("mode = drop\nports = 22,443\n");
-    const ProcessResult move = veltctl({"ftp", "set", "portnum=2131"});
-    EXPECT_NE(move.exitCode, 0) << "nobody could reach the new port";
-    EXPECT_TRUE(contains(move.errors, firewallFile + ", line 3")) << move.errors;
-    EXPECT_EQ(fetchHome(), "alice");
-    std::string found = diagnosis();
-    EXPECT_EQ(found, "firewall-settings-damaged: Correct the file, then restart veltd.\n");
-    ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
-    EXPECT_NE(diagnosis(), "");
-    const std::string words = veltctl({"doctor"}).output;
-    EXPECT_TRUE(contains(words, "No rules of this system are in force")) << words;
-    setFirewall("mode = drop\nports = 22 443\n");
-    mend(found, "firewall-settings-damaged");
-    EXPECT_EQ(diagnosis(), "");
-    ASSERT_EQ(runProcess({"nft", "flush", "ruleset"}).exitCode, 0);
-    found = diagnosis();
-    EXPECT_EQ(found, "firewall-rules-missing: Restart veltd.\n");
-    mend(found, "firewall-rules-missing");
-    ASSERT_EQ(runProcess({"nft", "add table inet other; add chain inet other input { type filter hook input "
-                                 "priority 0; policy drop; }; add rule inet other input iif lo accept"})
-                  .exitCode,
-              0);
-    found = diagnosis();
-    EXPECT_EQ(found, "firewall-foreign-drop: nft list chain inet other input\n");
-    mend(found, "firewall-foreign-drop"); // shows whose chain it is
-    ASSERT_EQ(runProcess({"nft", "delete table inet other"}).exitCode, 0);
-    EXPECT_EQ(diagnosis(), "");
-}
-
-TEST_F(HostHealth, RulesThatLockTheAdministratorOutAreNotLoaded) {
-    const NamedListener ssh("sshd", 2022);
-    done({"ftp", "set", "enable_ftp=on"});
-    setFirewall("mode = drop\nports = 22\n");
-    EXPECT_EQ(stopHost(), 0);
-    startHost();
-    std::string found = diagnosis();
-    EXPECT_EQ(found, "firewall-locks-out: Add 2022 to \"ports\" in " + firewallFile +
-                         ", then restart veltd.\n"
-                         "firewall-rules-missing: Restart veltd.\n");
-    const ProcessResult move = veltctl({"ftp", "set", "portnum=2131"});
-    EXPECT_NE(move.exitCode, 0);
-    EXPECT_TRUE(contains(move.errors, "they would close port 2022, by which sshd is reached")) << move.errors;
-    setFirewall("mode = drop\nports = 22 2022\n");
-    mend(found, "firewall-locks-out");
-    EXPECT_EQ(diagnosis(), "");
-    EXPECT_EQ(runProcess({"nft", "list", "table", "inet", "velt_fileserv"}).exitCode, 0);
-}
-
 TEST_F(HostHealth, FilesThatKeepEverybodyOutAreFound) {
     done({"ftp", "set", "enable_ftp=on"});
     const std::string all = contentsOf(sharesFile);
@@ -283,6 +223,17 @@ TEST_F(HostHealth, SettingsThatNoStartCouldUseAreFoundWhileTheServiceRuns) {
         }
     }
     EXPECT_EQ(diagnosis(), "");
+}
+
+TEST_F(HostHealth, APortThatCannotBeJudgedIsRefusedWithTheReason) {
+    const fs::path file = worldRoot / "etc/velt/known_services.conf";
+    writeFile(file, "junk\n");
+    const ProcessResult move = veltctl({"ftp", "set", "enable_ftp=on", "portnum=2191"});
+    EXPECT_NE(move.exitCode, 0);
+    EXPECT_TRUE(contains(move.errors, "Cannot read " + file.string() + ", line 1: expected a port"))
+        << move.errors;
+    EXPECT_FALSE(contains(move.errors, "from 1 to 65535")) << move.errors;
+    fs::remove(file);
 }
 
 TEST_F(HostHealth, AShareThatKeepsAnonymousUsersOutIsFound) {

@@ -53,16 +53,52 @@ TEST_F(FirewallHealth, RulesThatDoNotFollowAPortAreNamed) {
     EXPECT_NE(found.at(0).sentence.find("2122, 55536-55899"), std::string::npos) << found.at(0).sentence;
 }
 
+void nft(const std::string& command) {
+    const ProcessResult done = runProcess({"nft", "-f", "-"}, command + "\n");
+    ASSERT_EQ(done.exitCode, 0) << done.errors;
+}
+
 TEST_F(FirewallHealth, AChainOfOthersThatDropsIsNamed) {
-    setMode("mode = accept");
+    for (const char* mode : {"mode = accept", "mode = off"}) {
+        setMode(mode);
+        ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+        nft("add table inet other; add chain inet other input { type filter hook input priority 0; policy "
+            "drop; }");
+        const Findings found = firewallFindings();
+        EXPECT_EQ(summary(found), "error firewall-foreign-drop") << mode;
+        EXPECT_EQ(found.at(0).sentence, "The chain \"inet other input\" of another firewall closes ports of "
+                                        "the file services: 2121, 55536-55899.");
+        EXPECT_EQ(found.at(0).mend, "nft list chain inet other input");
+        nft("add rule inet other input tcp dport { 2121, 55536-55899 } accept");
+        EXPECT_EQ(firewallFindings(), Findings()) << mode;
+        nft("delete table inet other");
+    }
+}
+
+TEST_F(FirewallHealth, RulesThatWereChangedByHandAreNamed) {
+    setMode("mode = drop");
     ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
-    ASSERT_EQ(runProcess({"nft", "add table inet other; add chain inet other input { type filter hook input "
-                                 "priority 0; policy drop; }"})
-                  .exitCode,
-              0);
-    const Findings found = firewallFindings();
-    EXPECT_EQ(summary(found), "warning firewall-foreign-drop");
-    EXPECT_EQ(found.at(0).mend, "nft list chain inet other input");
+    for (const char* change :
+         {"insert rule inet velt_fileserv input tcp dport 2121 drop", "flush chain inet velt_fileserv logins",
+          "delete element inet velt_fileserv tcp_login { 2121 }",
+          "insert rule inet velt_fileserv input accept"}) {
+        EXPECT_EQ(firewallFindings(), Findings()) << change;
+        nft(change);
+        const Findings found = firewallFindings();
+        EXPECT_EQ(summary(found), "error firewall-rules-changed") << change;
+        EXPECT_EQ(found.at(0).mend, "Restart veltd.");
+        ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    }
+    EXPECT_EQ(firewallFindings(), Findings());
+}
+
+TEST_F(FirewallHealth, BansAndTheTablesOfOthersAreNoChange) {
+    setMode("mode = drop");
+    ASSERT_EQ(VELTFwRuleHup(), 0) << lastErrorSentence();
+    nft("add element inet velt_fileserv banned4 { 192.0.2.7 timeout 60s }");
+    EXPECT_EQ(firewallFindings(), Findings());
+    nft("add table inet other; add chain inet other input { type filter hook input priority 0; }");
+    EXPECT_EQ(firewallFindings(), Findings());
 }
 
 TEST(TableReading, TakesWhatNftLists) {

@@ -1,7 +1,6 @@
 // The firewall's settings and rules as text.
 
 #include "standalone/firewall/banned_sources.h"
-#include "standalone/firewall/foreign_tables.h"
 #include "standalone/firewall/ruleset.h"
 #include "tests/standalone/support/state_folder.h"
 #include "tests/support/result.h"
@@ -160,22 +159,6 @@ TEST_F(FirewallSettingsFile, ThatIsDamagedIsNamedWithItsLine) {
     for (const auto& [text, complaint] : damaged) {
         EXPECT_EQ(test::messageOf(load(text)),
                   "Cannot read " + (root_.path() / "etc/velt/firewall.conf").string() + complaint + ".");
-    }
-}
-
-TEST(ForeignTables, ThatDropAreFound) {
-    const auto chain = [](const char* table, const char* hook, const char* policy) {
-        return std::string(R"({"chain":{"family":"inet","table":")") + table +
-               R"(","name":"input","hook":")" + hook + R"(","policy":")" + policy + "\"}}";
-    };
-    const std::string list =
-        R"({"nftables":[{"metainfo":{}},{"chain":{"family":"ip","table":"x","name":"y"}},)" +
-        chain("filter", "input", "drop") + "," + chain("open", "input", "accept") + "," +
-        chain("out", "output", "drop") + "," + chain("velt_fileserv", "input", "drop") + "]}";
-    EXPECT_EQ(foreignDropChains(list), std::vector<std::string>{"inet filter input"});
-    for (const char* text :
-         {"", "no list", "[]", "{}", R"({"nftables":{}})", R"({"nftables":[1,{"chain":2}]})"}) {
-        EXPECT_TRUE(foreignDropChains(text).empty()) << text;
     }
 }
 
