@@ -14,7 +14,7 @@ std::string readInput(Console& console, const std::string& name) {
     }
     auto text = readFile(name);
     if (!text) {
-        throw Failure(ExitCode::usage, text.error().message,
+        throw Failure(ExitCode::local, text.error().message,
                       "Name a readable file, or - for the standard input.");
     }
     return std::move(*text);

@@ -1,4 +1,5 @@
 #include "base/json_value.h"
+#include "base/number_text.h"
 #include "base/printable.h"
 #include "cli/change_report.h"
 #include "cli/command.h"
@@ -120,8 +121,15 @@ void confirm(Context& context, const HistoryOptions& options) {
     }
 }
 
+std::string faultOfId(const std::string& text) {
+    return parseNumber(text).value_or(0) > 0
+               ? ""
+               : "\"" + printable(text) +
+                     "\": expected the number of a change, as 'veltctl history' lists them";
+}
+
 void addId(CLI::App* command, HistoryOptions& options, const char* text) {
-    command->add_option("id", options.id, text)->check(CLI::PositiveNumber)->type_name("");
+    command->add_option("id", options.id, text)->check(CLI::Validator(faultOfId, ""))->type_name("");
 }
 
 } // namespace
@@ -131,7 +139,7 @@ void addHistoryCommands(CLI::App& app, Command& chosen) {
     CLI::App* list = app.add_subcommand("history", "Show the changes of the settings, or one of them");
     addId(list, *options, "Show this change field by field");
     list->add_option("--before", options->before, "Only changes older than this one")
-        ->check(CLI::PositiveNumber)
+        ->check(CLI::Validator(faultOfId, ""))
         ->type_name("ID");
     list->add_option("--limit", options->limit, "Number of changes to show (default 20)")
         ->check(CLI::Range(1, 1000))

@@ -230,7 +230,8 @@ void checkRules(const Json::Value& rules, Errors& errors) {
         } else if (!owners.emplace(rules[i]["type"].asString(), rules[i]["name"].asString()).second) {
             const std::string type = rules[i]["type"].asString();
             errors.push_back({place + "/name", "one rule for each " + type + ", not a second one for " +
-                                                   rules[i]["name"].asString()});
+                                                   rules[i]["name"].asString() +
+                                                   ": remove the first, or change its path"});
         }
     }
 }

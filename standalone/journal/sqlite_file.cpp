@@ -31,11 +31,13 @@ int switchToWal(sqlite3* database) {
 }
 
 /// Names and addresses are in it: SQLite would make the file readable to all. Its side files take its mode.
-Result<> makeFile(const std::filesystem::path& path) {
+/// One that is there must not be opened: closing it again would take away the locks of this process's other
+/// connections, and whoever closes the database next would delete its side files under them.
+Result<> makeMissingFile(const std::filesystem::path& path) {
     std::error_code error;
     std::filesystem::create_directories(path.parent_path(), error);
-    const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
-    if (!fd) {
+    const UniqueFd fd(::open(path.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+    if (!fd && errno != EEXIST) {
         return Error(ErrorNumber::log, "Cannot open the administrator log " + path.string() + ": " +
                                            std::strerror(errno) + ".");
     }
@@ -54,7 +56,7 @@ int execute(sqlite3* database, const char* sql) {
 }
 
 Result<DatabaseOwner> openDatabase(const std::filesystem::path& path) {
-    VELT_RETURN_IF_ERROR(makeFile(path));
+    VELT_RETURN_IF_ERROR(makeMissingFile(path));
     const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
     sqlite3* opened = nullptr;
     const int result = sqlite3_open_v2(path.c_str(), &opened, flags, nullptr);

@@ -98,7 +98,7 @@ TEST_F(DocumentTest, TheOrderOfRulesCounts) {
 
 TEST_F(DocumentTest, WhatIsNoDocumentIsNotSent) {
     EXPECT_EQ(run({"import", "-"}, "{").code, 3);
-    EXPECT_EQ(run({"import", folder.path("absent")}).code, 2);
+    EXPECT_EQ(run({"import", folder.path("absent")}).code, 1);
     EXPECT_TRUE(asked().empty());
     host.answerWith(change, problemReply(422, R"({"title": "Unprocessable Content", "changed": false,
         "detail": "/ftp/x: expected one of the settings. Nothing was changed."})"));

@@ -74,6 +74,14 @@ TEST_F(HistoryTest, TheOneThatWaitsIsConfirmed) {
     EXPECT_NE(run({"confirm"}).err.find("There is no change to confirm."), std::string::npos);
 }
 
+TEST_F(HistoryTest, WhatIsNoIdIsRefusedInWords) {
+    for (const Words& words : {Words{"history", "foo"}, {"undo", "0"}, {"confirm", "-1"}}) {
+        const RunResult result = run(words);
+        EXPECT_EQ(result.code, 2);
+        EXPECT_NE(result.err.find("expected the number of a change"), std::string::npos) << result.err;
+    }
+}
+
 TEST_F(HistoryTest, OfSeveralThatWaitOneHasToBeNamed) {
     answer("GET /api/history?limit=100",
            R"({"changes": [{"id": 14, "state": "waiting"}, {"id": 13, "state": "done"},
@@ -101,7 +109,7 @@ TEST_F(HistoryTest, TwoStatesAreCompared) {
     EXPECT_EQ(same.out, "No difference.\n");
     EXPECT_EQ(sent("POST /api/diff").back(), jsonOf(R"({"from": {"ftp": {}}, "to": "now"})"));
     EXPECT_EQ(run({"diff"}).code, 2);
-    EXPECT_EQ(run({"diff", folder.path("absent")}).code, 2);
+    EXPECT_EQ(run({"diff", folder.path("absent")}).code, 1);
     answer("POST /api/diff", R"({"title": "There is no change 99 in the history."})", 404);
     const RunResult unknown = run({"diff", "99"});
     EXPECT_EQ(unknown.code, 3);

@@ -207,7 +207,7 @@ TEST_F(HostRefusal, aDaemonThatDoesNotTakeItsCertificateIsQuoted) {
     std::filesystem::create_directories(folder);
     writeFile(folder / "server.crt", "no certificate\n");
     writeFile(folder / "server.key", "no key\n");
-    expectFailure({"ftp", "set", "enable_ftps=on"}, 3, "server.crt");
+    expectFailure({"ftp", "set", "enable_ftps=on"}, 4, "server.crt");
     EXPECT_EQ(fetchHome(), "alice") << "the service goes on with its former settings";
     std::filesystem::remove_all(folder);
 }

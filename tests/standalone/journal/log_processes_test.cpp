@@ -9,8 +9,10 @@
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <filesystem>
 #include <map>
 #include <set>
+#include <string>
 #include <thread>
 
 namespace velt {
@@ -69,6 +71,28 @@ TEST(LogProcesses, ThreadsBesideAnotherProcessLoseNothing) {
     EXPECT_EQ(test::finish(writer), 0);
     EXPECT_EQ(countByActor(),
               (std::map<std::string, int>{{"process", each}, {"first", each}, {"second", each}}));
+}
+
+// Whoever closes the database last deletes its side files, and finds out by the locks of the others.
+TEST(LogProcesses, OneThatEndsTakesNothingFromThoseThatGoOn) {
+    const test::TemporaryFolder folder;
+    setStateRoot(folder.path());
+    setRequestActor("stays", "");
+    ASSERT_EQ(VELTLogSet1(1, 1, 0x11B00024, "x", "", "", ""), 0) << lastErrorSentence();
+    ASSERT_TRUE(recordChange({}));
+    ASSERT_TRUE(queryChanges({}));
+    const auto wal = folder.path() / "var/lib/velt/log.db-wal";
+    ASSERT_TRUE(std::filesystem::exists(wal));
+    EXPECT_EQ(test::finish(test::start({LOG_WRITER, folder.path().string(), "ends", std::to_string(each)})),
+              0);
+    EXPECT_TRUE(std::filesystem::exists(wal));
+    ASSERT_EQ(VELTLogSet1(1, 1, 0x11B00024, "x", "", "", ""), 0) << lastErrorSentence();
+    EXPECT_TRUE(recordChange({}));
+    EXPECT_EQ(test::finish(test::start({LOG_WRITER, folder.path().string(), "next", std::to_string(each)})),
+              0);
+    EXPECT_EQ(countByActor(), (std::map<std::string, int>{{"stays", 2}, {"ends", each}, {"next", each}}));
+    EXPECT_EQ(queryChanges({}).valueOr({}).size(), 2U);
+    setRequestActor("", "");
 }
 
 TEST(LogProcesses, AWriterThatIsKilledLeavesAWholeLog) {
