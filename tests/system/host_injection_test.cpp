@@ -32,7 +32,7 @@ const std::vector<Attempt>& attempts() {
         {"an option", R"("-oProxyCommand=touch /mnt/injected")"},
         {"a command",
          R"("$(touch /mnt/injected)`touch /mnt/injected`;touch /mnt/injected|touch /mnt/injected")"},
-        {"an SQL text", R"("x'; DROP TABLE entries; --")"},
+        {"an SQL text", R"("x'; DROP TABLE entry; --")"},
         {"a NUL", R"("alice\u0000/../../etc")"},
         {"control characters", R"("\u001b[31m\u0007\u007f")"},
         {"letters beyond ASCII", "\"gr\xc3\xbc\xc3\x9f \xf0\x9f\x98\x80\""},
@@ -129,7 +129,7 @@ TEST_F(HostInjection, noTextOfARequestIsMoreThanAText) {
             const testing::ScopedTrace trace(__FILE__, __LINE__,
                                              std::string(place.what) + ": " + attempt.what);
             const HttpResult answer = curl(place.path, filled(place.body, attempt.json));
-            EXPECT_TRUE(answer.status >= 200 && answer.status < 600 && answer.status != 408) << answer.status;
+            EXPECT_TRUE(answer.status >= 200 && answer.status < 500 && answer.status != 408) << answer.status;
             if (attempt.what == std::string("bytes that are no UTF-8")) {
                 EXPECT_EQ(answer.status, 400) << answer.body;
             }
@@ -137,7 +137,7 @@ TEST_F(HostInjection, noTextOfARequestIsMoreThanAText) {
                 EXPECT_EQ(answer.status, 422) << answer.body;
             }
             EXPECT_FALSE(contains(answer.body, "The module is faulty")) << answer.body;
-            EXPECT_FALSE(contains(answer.body, "The host failed")) << answer.body;
+            EXPECT_FALSE(contains(answer.body, "veltd failed")) << answer.body;
             expectNoTrace();
         }
         const testing::ScopedTrace trace(__FILE__, __LINE__, place.what);
@@ -154,7 +154,7 @@ TEST_F(HostInjection, noTextOfARequestIsMoreThanAText) {
 TEST_F(HostInjection, noFilterIsMoreThanAFilter) {
     const auto lines = [](const std::string& text) { return std::ranges::count(text, '\n'); };
     const auto all = lines(done({"log", "--all"}));
-    for (const std::string text : {"x' OR '1'='1", "root'; DROP TABLE entries; --", "%", "*", "ro%t", "_oot",
+    for (const std::string text : {"x' OR '1'='1", "root'; DROP TABLE entry; --", "%", "*", "ro%t", "_oot",
                                    "root\n", "-1", "\xff\xfe", "\""}) {
         for (const char* filter : {"--actor", "--event", "--since", "--before"}) {
             const testing::ScopedTrace trace(__FILE__, __LINE__, filter + (" " + text));
