@@ -84,6 +84,22 @@ static int is_special(const struct in6_addr* address) {
            IN6_IS_ADDR_LINKLOCAL(address) || IN6_IS_ADDR_MULTICAST(address);
 }
 
+/* The address to which a gateway would translate this one: RFC 6052 (NAT64), RFC 3056 (6to4). */
+static struct in6_addr translated(const struct in6_addr* address) {
+    static const uint8_t nat64[12] = {0x00, 0x64, 0xff, 0x9b};
+    struct in6_addr plain = *address;
+    uint32_t ipv4 = 0;
+
+    if (memcmp(address->s6_addr, nat64, sizeof(nat64)) == 0) {
+        memcpy(&ipv4, address->s6_addr + 12, sizeof(ipv4));
+        map(ntohl(ipv4), &plain);
+    } else if (address->s6_addr[0] == 0x20 && address->s6_addr[1] == 0x02) {
+        memcpy(&ipv4, address->s6_addr + 2, sizeof(ipv4));
+        map(ntohl(ipv4), &plain);
+    }
+    return plain;
+}
+
 static int is_at(const struct in6_addr* address, const struct sockaddr* interface) {
     struct in6_addr own;
 
@@ -102,7 +118,8 @@ static int is_at(const struct in6_addr* address, const struct sockaddr* interfac
 
 int velt_is_inside(const struct in6_addr* address) {
     struct ifaddrs* interfaces = NULL;
-    int found = is_special(address);
+    const struct in6_addr plain = translated(address);
+    int found = is_special(&plain);
 
     if (found) {
         return 1;
@@ -111,7 +128,7 @@ int velt_is_inside(const struct in6_addr* address) {
         return 1;
     }
     for (const struct ifaddrs* one = interfaces; one != NULL && !found; one = one->ifa_next) {
-        found = is_at(address, one->ifa_addr);
+        found = is_at(address, one->ifa_addr) || is_at(&plain, one->ifa_addr);
     }
     freeifaddrs(interfaces);
     return found;

@@ -63,12 +63,12 @@ TEST(DataAddress, isInsideWhereItLeadsToThisServerOrToNobody) {
     for (const char* inside :
          {"::1", "::", "fe80::1", "febf::1", "ff02::1", "ff0e::1", "::ffff:127.0.0.1", "::ffff:127.255.0.1",
           "::ffff:0.0.0.0", "::ffff:0.1.2.3", "::ffff:169.254.0.1", "::ffff:224.0.0.1", "::ffff:240.0.0.1",
-          "::ffff:255.255.255.255", "::127.0.0.1"}) {
+          "::ffff:255.255.255.255", "::127.0.0.1", "64:ff9b::7f00:1", "2002:7f00:1::1", "2002:a9fe:1::"}) {
         EXPECT_TRUE(isInside(inside)) << inside;
     }
-    for (const char* outside :
-         {"::ffff:198.51.100.9", "::ffff:169.253.0.1", "::ffff:169.255.0.1", "::ffff:126.255.255.255",
-          "::ffff:128.0.0.1", "::ffff:223.255.255.255", "2001:db8::9", "fec0::1"}) {
+    for (const char* outside : {"::ffff:198.51.100.9", "::ffff:169.253.0.1", "::ffff:169.255.0.1",
+                                "::ffff:126.255.255.255", "::ffff:128.0.0.1", "::ffff:223.255.255.255",
+                                "2001:db8::9", "fec0::1", "64:ff9b::c633:6409", "2002:c633:6409::1"}) {
         EXPECT_FALSE(isInside(outside)) << outside;
     }
 }
