@@ -1,5 +1,6 @@
 #include "base/utf8.h"
 
+#include <algorithm>
 #include <array>
 
 namespace velt {
@@ -63,12 +64,37 @@ std::size_t findInvalidUtf8(std::string_view text) {
     return std::string_view::npos;
 }
 
+namespace {
+
+struct Codes {
+    char32_t first;
+    char32_t last;
+};
+
+constexpr std::array<Codes, 9> unseen{{{0x00, 0x1F},
+                                       {0x7F, 0x9F},
+                                       {0xAD, 0xAD},
+                                       {0x61C, 0x61C},
+                                       {0x180E, 0x180E},
+                                       {0x200B, 0x200F},
+                                       {0x2028, 0x206F},
+                                       {0xFEFF, 0xFEFF},
+                                       {0xFFF9, 0xFFFB}}};
+constexpr Codes tags{0xE0000, 0xE007F};
+
+bool contains(const Codes& codes, char32_t code) {
+    return code >= codes.first && code <= codes.last;
+}
+
+} // namespace
+
 bool holdsSteering(std::string_view text) {
     while (!text.empty()) {
         const auto [length, code] = firstUtf8Character(text);
-        const bool control = code < 0x20 || (code >= 0x7F && code < 0xA0);
-        const bool direction = (code >= 0x202A && code <= 0x202E) || (code >= 0x2066 && code <= 0x2069);
-        if (length == 0 || control || direction) {
+        const bool steers = contains(tags, code) || std::ranges::any_of(unseen, [code](const Codes& codes) {
+                                return contains(codes, code);
+                            });
+        if (length == 0 || steers) {
             return true;
         }
         text.remove_prefix(length);

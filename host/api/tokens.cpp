@@ -46,8 +46,7 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     }
     const Json::Value& name = (*body)["name"];
     if (!isName(name)) {
-        return fieldProblem(422,
-                            {"name", "a string of 1 to 64 bytes without control and direction characters"},
+        return fieldProblem(422, {"name", "a string of 1 to 64 bytes of characters that can be seen"},
                             noneMade, call.id);
     }
     const Json::Value& word = (*body)["role"];

@@ -96,17 +96,20 @@ TEST_F(HostTokens, OnlyATokensOwnPathRemovesIt) {
 
 TEST_F(HostTokens, ATokenNeedsANameAndARole) {
     start();
-    for (const char* body : {"{}", R"({"name":"x"})", R"({"name":"","role":"admin"})",
-                             R"({"name":7,"role":"admin"})", R"({"name":"x","role":"root"})",
-                             R"({"name":"a\nb","role":"admin"})", R"({"name":"a\u007f","role":"admin"})",
-                             R"({"name":"\u0080","role":"admin"})", R"({"name":"a\u009bb","role":"admin"})",
-                             R"({"name":"\u202a","role":"admin"})", R"({"name":"a\u202eb","role":"admin"})",
-                             R"({"name":"\u2066","role":"admin"})", R"({"name":"a\u2069","role":"admin"})"}) {
+    for (const char* body :
+         {"{}", R"({"name":"x"})", R"({"name":"","role":"admin"})", R"({"name":7,"role":"admin"})",
+          R"({"name":"x","role":"root"})", R"({"name":"a\nb","role":"admin"})",
+          R"({"name":"a\u007f","role":"admin"})", R"({"name":"\u0080","role":"admin"})",
+          R"({"name":"a\u009bb","role":"admin"})", R"({"name":"\u202a","role":"admin"})",
+          R"({"name":"a\u202eb","role":"admin"})", R"({"name":"a\u200bb","role":"admin"})",
+          R"({"name":"a\u00adb","role":"admin"})", R"({"name":"a\u061cb","role":"admin"})",
+          R"({"name":"\ufeffa","role":"admin"})", R"({"name":"a\udb40\udc41","role":"admin"})",
+          R"({"name":"\u2066","role":"admin"})", R"({"name":"a\u2069","role":"admin"})"}) {
         EXPECT_EQ(post("/api/tokens", body).status, 422) << body;
     }
     EXPECT_EQ(post("/api/tokens", "[").status, 400);
     EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
-    for (const char* body : {R"({"name":"\u00a0\u2029\u202f\u2065\u206a","role":"admin"})",
+    for (const char* body : {R"({"name":"\u00a0\u200a\u2010\u2027\u2070","role":"admin"})",
                              R"({"name":"Zo\u00eb, \u05d0","role":"admin"})"}) {
         EXPECT_EQ(post("/api/tokens", body).status, 201) << body;
     }
