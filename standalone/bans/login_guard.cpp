@@ -49,14 +49,32 @@ std::string nameOf(const std::string& service) {
     return found == names.end() ? service : found->second;
 }
 
-/// Writes it into the list and into the firewall, which agree with each other under the lock.
-Result<> putInForce(const Ban& ban, std::chrono::seconds duration) {
-    return perform(Effect::store, "bans", [&]() -> Result<> {
-        VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
-        VELT_RETURN_IF_ERROR(storeBan(ban, Clock::now()));
-        const auto refused = banSource({ban.source, duration});
-        return refused ? Result<>() : Result<>(refused.error());
-    });
+/// Writes it into the list and into the firewall, which agree with each other under the lock. True when the
+/// list has it now. A source that is banned already keeps its ban.
+Result<bool> store(const Ban& ban) {
+    VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
+    const auto now = Clock::now(); // whoever had the lock may have kept it for long
+    VELT_ASSIGN_OR_RETURN(const auto bans, bansAt(now));
+    const auto former = banOf(ban.source, bans);
+    if (!former) {
+        VELT_RETURN_IF_ERROR(storeBan(ban, now));
+    }
+    // Also for one that is banned already: if it still gets to guess, the firewall may have failed.
+    const Ban& current = former ? *former : ban;
+    const auto left = std::chrono::floor<std::chrono::seconds>(current.until - now);
+    if (const auto refused = banSource({current.source, left}); !refused) {
+        complain(refused.error()); // the list counts nevertheless
+    }
+    return !former;
+}
+
+Result<bool> putInForce(const Ban& ban) {
+    bool begins = false;
+    VELT_RETURN_IF_ERROR(perform(Effect::store, "bans", [&]() -> Result<> {
+        VELT_ASSIGN_OR_RETURN(begins, store(ban));
+        return {};
+    }));
+    return begins;
 }
 
 void tell(const std::string& action, const Ban& ban) {
@@ -70,9 +88,12 @@ void tell(const std::string& action, const Ban& ban) {
 }
 
 void impose(const Ban& ban, std::chrono::seconds duration) {
-    // The list counts although the firewall may have failed.
-    if (const auto inForce = putInForce(ban, duration); !inForce) {
-        complain(inForce.error());
+    const auto begins = putInForce(ban);
+    if (!begins) {
+        complain(begins.error());
+    }
+    if (!begins.valueOr(false)) {
+        return; // who goes on guessing must not fill the log
     }
     const auto logged = logEvent(logCategory, logLevel, bannedEvent,
                                  {toText(ban.source).c_str(), std::to_string(duration.count()).c_str(),

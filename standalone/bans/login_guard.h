@@ -17,7 +17,8 @@
 namespace velt {
 
 /// Counts a failed login at "ftp", "sftp" or "veltd" from this address, and bans its source when there were
-/// too many. What goes wrong then is in syslog.
+/// too many. A source that is banned already keeps its ban, and nothing is logged. Waits for the state lock
+/// then. What goes wrong is in syslog.
 void noteFailedLogin(const std::string& service, const IpNetwork& address);
 
 /// The same for an address as text; one that is none is passed over.

@@ -75,6 +75,29 @@ TEST_F(LoginGuard, BansTheNetworkOfACustomer) {
     EXPECT_FALSE(currentBanOf("2001:db8:0:1::99"));
 }
 
+TEST_F(LoginGuard, BansAndLogsOnceWhoGoesOnGuessing) {
+    fail("192.0.2.1", 3);
+    const auto first = currentBanOf("192.0.2.1");
+    ASSERT_TRUE(first);
+    const std::string event = root_.read("var/log/velt/events.jsonl");
+    set("failures = 1\nban_seconds = 1800");
+    fail("192.0.2.1", 30);
+    fail("192.0.2.1", 30, "ftp");
+    EXPECT_EQ(currentBanOf("192.0.2.1"), first);
+    EXPECT_EQ(logged().size(), 1U);
+    EXPECT_EQ(root_.read("var/log/velt/events.jsonl"), event);
+}
+
+TEST_F(LoginGuard, BansAgainWhenABanHasEnded) {
+    fail("192.0.2.1", 3);
+    root_.write("run/velt/bans", "192.0.2.1 1000000000 sftp 3\n");
+    fail("192.0.2.1", 2);
+    EXPECT_EQ(banned(), "");
+    fail("192.0.2.1", 1);
+    EXPECT_EQ(banned(), "192.0.2.1 sftp ");
+    EXPECT_EQ(logged().size(), 2U);
+}
+
 TEST_F(LoginGuard, TellsWhoseFailuresAreCountedTogether) {
     EXPECT_EQ(sourceOfLogin("192.0.2.1"), "192.0.2.1");
     EXPECT_EQ(sourceOfLogin("2001:db8::1"), "2001:db8::/64");
