@@ -155,10 +155,11 @@ int main(int argc, char** argv) {
     const std::string name = logName(argv[2]);
     ::openlog(name.c_str(), LOG_PID, LOG_DAEMON);
     try {
-        return argc == managedArguments ? superviseForManager(argv[1], argv[2])
-                                        : superviseDetached(argc, argv);
+        const int status =
+            argc == managedArguments ? superviseForManager(argv[1], argv[2]) : superviseDetached(argc, argv);
+        ::_exit(status); // the thread that counts failed logins may be in the middle of something
     } catch (const std::exception& error) {
         ::syslog(LOG_CRIT, "%s", error.what());
-        return 1;
+        ::_exit(1);
     }
 }

@@ -232,13 +232,10 @@ DaemonState Supervisor::processes() const {
 
 Result<SessionCount> Supervisor::settleSessions(const std::vector<ProcessId>& sessions, bool end) {
     const int count = static_cast<int>(sessions.size());
-    if (!end) {
-        return SessionCount{0, count};
-    }
-    if (!endTrees(sessions, patience)) {
+    if (end && !endTrees(sessions, patience)) {
         return Error("some of its sessions did not end");
     }
-    return SessionCount{count, 0};
+    return end ? SessionCount{count, 0} : SessionCount{0, count};
 }
 
 Result<SessionCount> Supervisor::pause() {
@@ -330,7 +327,10 @@ void Supervisor::onSignals() {
 
 void Supervisor::reapChildren() {
     int status = 0;
-    for (pid_t pid = ::waitpid(-1, &status, WNOHANG); pid > 0; pid = ::waitpid(-1, &status, WNOHANG)) {
+    // Other threads wait for what they start. Processes that lost their parent are those of this first
+    // thread.
+    constexpr int ownOnes = WNOHANG | __WNOTHREAD;
+    for (pid_t pid = ::waitpid(-1, &status, ownOnes); pid > 0; pid = ::waitpid(-1, &status, ownOnes)) {
         if (pid == daemon_->id().pid) {
             onDaemonEnd(status);
         }

@@ -3,6 +3,7 @@
 #include "base/file.h"
 #include "standalone/bans/ban_list.h"
 #include "standalone/control/supervised_daemon.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "tests/standalone/supervise/daemon_test.h"
 #include "tests/support/ports.h"
@@ -15,8 +16,8 @@ namespace velt::test {
 namespace {
 
 const std::string head = "2026-11-22 08:00:00,123 server proftpd[1] 192.0.2.1 (192.0.2.7[192.0.2.7]): ";
-/// Whose failed login ends all that a daemon says.
-const std::string last = "198.51.100.1";
+/// Those whose failed login ends all that a daemon says.
+const std::string lastOnes = "198.51.100.";
 
 class LoginWatch : public DaemonTest {
 protected:
@@ -26,7 +27,8 @@ protected:
     }
 
     /// Who is banned, as a text, once a daemon has said these messages and all of them have been read.
-    static std::string bannedAfter(const Daemon& daemon, std::vector<std::string> messages) {
+    std::string bannedAfter(const Daemon& daemon, std::vector<std::string> messages) {
+        const std::string last = lastOnes + std::to_string(++daemons_);
         messages.push_back(daemon.name == ftpDaemon.name
                                ? head + "mod_velt_login: password refused from " + last + "\n"
                                : "Failed password for bob from " + last + " port 53076 ssh2\r\n");
@@ -36,14 +38,13 @@ protected:
         }
         SupervisedDaemon supervised(daemon);
         EXPECT_EQ(messageOf(supervised.start(testOrder(freePort(), "one", options))), "");
-        EXPECT_TRUE(waitUntil([] { return banned().contains(last); }, patience));
+        EXPECT_TRUE(waitUntil([&] { return banned().contains(last); }, patience));
         std::set<std::string> others = banned();
-        others.erase(last);
+        std::erase_if(others, [](const std::string& each) { return each.starts_with(lastOnes); });
         EXPECT_EQ(messageOf(supervised.stop()), "");
         return testing::PrintToString(others);
     }
 
-private:
     static std::set<std::string> banned() {
         std::set<std::string> sources;
         for (const Ban& ban : bansAt(Ban::Clock::now()).valueOr({})) {
@@ -51,6 +52,9 @@ private:
         }
         return sources;
     }
+
+private:
+    int daemons_ = 0;
 };
 
 const std::string nobody = "{}";
@@ -85,6 +89,24 @@ TEST_F(LoginWatch, ADaemonsWordsAreReadAsItsOwnOnly) {
     EXPECT_EQ(bannedAfter(ftpDaemon, {"Failed password for alice from 192.0.2.7 port 53076 ssh2\r\n"}),
               nobody);
     EXPECT_EQ(bannedAfter(sftpDaemon, {head + "mod_velt_login: password refused from 192.0.2.7\n"}), nobody);
+}
+
+TEST_F(LoginWatch, GuessesDoNotKeepTheSupervisorFromAnswering) {
+    const std::vector<std::string> guesses{
+        "--say", "Failed password for alice from 192.0.2.7 port 53076 ssh2\r\n", "--say",
+        "Failed password for alice from 192.0.2.8 port 53076 ssh2\r\n"};
+    SupervisedDaemon daemon(sftpDaemon);
+    {
+        auto changing = StateLock::take();
+        ASSERT_TRUE(changing);
+        EXPECT_EQ(messageOf(daemon.start(testOrder(freePort(), "one", guesses))), "");
+        EXPECT_EQ(messageOf(daemon.start(testOrder(freePort(), "two", guesses))), "");
+        EXPECT_EQ(messageOf(daemon.stop()), "");
+        EXPECT_EQ(messageOf(daemon.start(testOrder(freePort(), "three", guesses))), "");
+        EXPECT_EQ(banned(), std::set<std::string>());
+    }
+    EXPECT_TRUE(waitUntil([] { return banned().size() == 2; }, patience)) << "nothing is forgotten";
+    EXPECT_EQ(messageOf(daemon.stop()), "");
 }
 
 } // namespace
