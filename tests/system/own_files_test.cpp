@@ -39,8 +39,9 @@ TEST_F(OwnFiles, areNotMadeOverFtp) {
     start();
     FtpSession session(port);
     ASSERT_EQ(session.logIn("alice"), 230);
-    for (const std::string name : {".profile", ".bashrc", ".zshenv", ".forward", ".forward+list", ".rhosts",
-                                   ".qmail-all", ".k5login", ".BASHRC", ".pam_environment", ".ssh"}) {
+    for (const std::string name :
+         {".profile", ".bashrc", ".zshenv", ".zshenv.zwc", ".dovecot.svbin", "bin", ".forward",
+          ".forward+list", ".rhosts", ".qmail-all", ".k5login", ".BASHRC", ".pam_environment", ".ssh"}) {
         EXPECT_EQ(session.send("STOR " + name, "x"), 550) << name;
         EXPECT_EQ(session.send("APPE /" + name, "x"), 550) << name;
         EXPECT_EQ(session.command("MKD " + name).code, 550) << name;

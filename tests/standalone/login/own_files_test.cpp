@@ -11,6 +11,7 @@ extern "C" {
 #include <cerrno>
 #include <filesystem>
 #include <string>
+#include <vector>
 
 namespace velt::test {
 namespace {
@@ -47,10 +48,81 @@ TEST_F(OwnFiles, areKnownByName) {
         EXPECT_EQ(content(kept), "kept") << kept;
         EXPECT_EQ(name(kept), "kept") << kept;
     }
-    for (const char* free : {"ssh", ".ssh2", ".sh", ".", "profile", ".profile~", ".qmai", "x.forward"}) {
+    for (const char* free :
+         {"ssh", ".ssh2", ".sh", ".", "profile", ".profil", "binary", ".zsh", ".qmai", "x.forward"}) {
         EXPECT_EQ(content(free), "") << free;
     }
     EXPECT_EQ(refusal(folder_.path() / ".profile", velt_changes_name), "") << "no home";
+}
+
+struct Family {
+    const char* obeyedBy;
+    std::vector<std::string> names;
+};
+
+const std::vector<Family> families = {
+    {"logins by key or host", {".ssh", ".lsh", ".rhosts", ".shosts", ".klogin", ".k5login", ".k5users"}},
+    {"PAM",
+     {".eid", ".monkeysphere", ".google_authenticator", ".yubico", ".otpw", ".pamusb", ".pam_environment",
+      ".pam_mount.conf.xml", ".ecryptfs"}},
+    {"services of a login", {".config", ".local", ".byobu", ".gnupg", ".keychain", ".pulse", ".asoundrc"}},
+    {"mail",
+     {".forward", ".forward+list", ".procmail", ".procmailrc", ".mailfilter", ".mailfilters", ".maildelivery",
+      ".mailrc", ".msmtprc", ".qmail", ".qmail-list", ".courier", ".courier-list", ".dovecot.sieve",
+      ".dovecot.svbin"}},
+    {"sh and bash",
+     {".profile", ".profile.zwc", ".shrc", ".bashrc", ".bash_profile", ".bash_login", ".bash_logout",
+      ".bash_aliases", ".bash_aliases.zwc", ".bash_completion", ".inputrc"}},
+    {"csh", {".login", ".logout", ".cshrc", ".cshdirs", ".tcshrc"}},
+    {"ksh", {".kshrc", ".kshrc.zwc", ".mkshrc"}},
+    {"zsh",
+     {".zshenv", ".zprofile", ".zshrc", ".zlogin", ".zlogout", ".zshenv.zwc", ".zprofile.zwc", ".zshrc.zwc",
+      ".zlogin.zwc", ".zlogout.zwc", ".ZSHENV.ZWC", ".zshrc.local", ".zcompdump", ".zcompdump-host-5.9.zwc"}},
+    {"other shells", {".yashrc", ".yash_profile", ".rcrc", ".esrc", ".aliasrc", ".xonshrc", ".lessfilter"}},
+    {"search for programs", {"bin"}},
+    {"repositories", {"git-shell-commands", ".gitconfig", ".gitolite", ".gitolite.rc", ".hgrc", ".bazaar"}},
+    {"desktops",
+     {".vnc", ".xpra", "startwm.sh", ".xprofile", ".xsession", ".Xsession", ".xsessionrc", ".xinitrc",
+      ".xserverrc", ".xinputrc", ".xbindkeysrc", ".xbindkeysrc.scm", ".gnomerc"}},
+};
+
+TEST_F(OwnFiles, areThoseThatProgramsObey) {
+    keep();
+    for (const Family& family : families) {
+        for (const std::string& kept : family.names) {
+            EXPECT_EQ(content(kept), "kept") << family.obeyedBy << ": upload to " << kept;
+            EXPECT_EQ(name(kept), "kept") << family.obeyedBy << ": new folder or name " << kept;
+        }
+    }
+}
+
+TEST_F(OwnFiles, areFoldersOfThatKindToo) {
+    keep();
+    for (const std::string folder : {".ssh",
+                                     ".lsh",
+                                     ".eid",
+                                     ".monkeysphere",
+                                     ".pamusb",
+                                     ".ecryptfs",
+                                     ".config",
+                                     ".local",
+                                     ".byobu",
+                                     ".gnupg",
+                                     ".keychain",
+                                     ".pulse",
+                                     ".procmail",
+                                     ".mailfilters",
+                                     ".bash_completion",
+                                     "bin",
+                                     "git-shell-commands",
+                                     ".gitolite",
+                                     ".bazaar",
+                                     ".vnc",
+                                     ".xpra"}) {
+        fs::create_directory(home() / folder);
+        EXPECT_EQ(content(folder + "/file"), "kept") << folder;
+        EXPECT_EQ(name(folder + "/file"), "kept") << folder;
+    }
 }
 
 TEST_F(OwnFiles, includeWhatLiesInThem) {
