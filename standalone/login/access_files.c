@@ -1,5 +1,7 @@
 #include "standalone/login/access_files.h"
 
+#include "standalone/login/way.h"
+
 #include <errno.h>
 #include <fcntl.h>
 #include <limits.h>
@@ -29,6 +31,7 @@ struct noted {
 };
 
 static int folder = -1;
+static char folder_path[PATH_MAX];
 static struct noted noted[file_count] = {{-1, {0, 0, {0, 0}, {0, 0}}}, {-1, {0, 0, {0, 0}, {0, 0}}}};
 
 static void forget(int* file) {
@@ -69,18 +72,17 @@ static int note(const char* name, struct noted* one) {
 }
 
 int velt_note_access_files(const char* state_root) {
-    char path[PATH_MAX];
-
     forget(&folder);
     for (int i = 0; i < file_count; i++) {
         forget(&noted[i].file);
     }
-    if (snprintf(path, sizeof(path), "%s%s", state_root, folder_name) >= (int)sizeof(path)) {
+    if (snprintf(folder_path, sizeof(folder_path), "%s%s", state_root, folder_name) >=
+        (int)sizeof(folder_path)) {
         errno = ENAMETOOLONG;
         return -1;
     }
-    folder = open(path, O_PATH | O_DIRECTORY | O_CLOEXEC);
-    if (folder < 0) {
+    folder = open(folder_path, O_PATH | O_DIRECTORY | O_CLOEXEC);
+    if (folder < 0 || velt_begin_ways() < 0) {
         return -1;
     }
     for (int i = 0; i < file_count; i++) {
@@ -101,7 +103,20 @@ static int is_unchanged(const char* name, const struct noted* one) {
     return look(one->file, &now) == 0 && is_same(&now, &one->version);
 }
 
+/* The files of a folder that was exchanged stay as they were, but nobody reads them any more. Its own times
+ * would not tell, since they change with the other files in it. */
+static int is_folder_in_place(void) {
+    struct velt_way_end end;
+    struct stat status;
+
+    return fstat(folder, &status) == 0 && velt_walk_way(folder_path, "", NULL, &end) == 0 && end.exists &&
+           end.what.st_dev == status.st_dev && end.what.st_ino == status.st_ino;
+}
+
 int velt_access_files_changed(void) {
+    if (!is_folder_in_place()) {
+        return 1;
+    }
     for (int i = 0; i < file_count; i++) {
         if (!is_unchanged(file_names[i], &noted[i])) {
             return 1;

@@ -8,9 +8,10 @@
  * view is made, and before the root directory changes. 0, or -1 with errno. */
 int velt_note_access_files(const char* state_root);
 
-/* Whether they are others than those that were noted: written, replaced, made or removed since, or impossible
- * to look at. Works in any root directory and without rights to the files; but to see that there is still no
- * file, this process must be allowed to search the folder. */
+/* Whether they are others than those that were noted: written, replaced, made or removed since, also with
+ * their folder or one on the way to it, or impossible to look at. Works in any root directory and without
+ * rights to the files; but this process must be allowed to search the folders on the way to theirs, and, to
+ * see that there is still no file, theirs too. Else it says that they are others. */
 int velt_access_files_changed(void);
 
 #endif

@@ -114,6 +114,11 @@ TEST_F(OldSessions, areThoseFromBeforeAnyOfTheFilesWasTouched) {
         [&] { fs::remove(shares); },
         [&] { store(); },
         [&] { writeFile(rules, text); },
+        [&] {
+            const fs::path folder = shares.parent_path();
+            fs::rename(folder, folder.string() + ".away");
+            fs::copy(folder.string() + ".away", folder, fs::copy_options::recursive);
+        },
         [&] { fs::rename(rules, rules.string() + ".away"); },
     };
     for (const auto& change : changes) {

@@ -59,6 +59,32 @@ TEST_P(AccessFiles, areOthersWhenTheyAreReplaced) {
     EXPECT_TRUE(changed()) << "size and time of writing are the same";
 }
 
+TEST_P(AccessFiles, areOthersWhenAFolderOnTheirWayIsExchanged) {
+    const TemporaryFolder aside;
+    for (const char* name : {"etc/velt", "etc"}) {
+        const fs::path folder = root_.path() / name;
+        fs::rename(folder, aside.path() / "former");
+        EXPECT_TRUE(changed()) << name << " is gone";
+        fs::copy(aside.path() / "former", folder, fs::copy_options::recursive);
+        EXPECT_TRUE(changed()) << name << " is a copy";
+        fs::remove_all(folder);
+        fs::rename(aside.path() / "former", folder);
+        EXPECT_FALSE(changed()) << name << " is back";
+    }
+}
+
+TEST_P(AccessFiles, areOthersWhenALinkToThemLeadsElsewhere) {
+    const TemporaryFolder other;
+    fs::rename(root_.path() / "etc/velt", root_.path() / "kept");
+    fs::create_directory_symlink("../kept", root_.path() / "etc/velt");
+    note();
+    EXPECT_FALSE(changed());
+    fs::copy(root_.path() / "kept", other.path(), fs::copy_options::recursive);
+    fs::remove(root_.path() / "etc/velt");
+    fs::create_directory_symlink(other.path(), root_.path() / "etc/velt");
+    EXPECT_TRUE(changed());
+}
+
 TEST_P(AccessFiles, comeAndGo) {
     fs::remove(path());
     EXPECT_TRUE(changed());
