@@ -82,8 +82,9 @@ constexpr std::array<Codes, 9> unseen{{{0x00, 0x1F},
                                        {0xFFF9, 0xFFFB}}};
 constexpr Codes tags{0xE0000, 0xE007F};
 
-bool contains(const Codes& codes, char32_t code) {
-    return code >= codes.first && code <= codes.last;
+bool steers(char32_t code) {
+    const auto holds = [code](const Codes& codes) { return code >= codes.first && code <= codes.last; };
+    return holds(tags) || std::ranges::any_of(unseen, holds);
 }
 
 } // namespace
@@ -91,10 +92,7 @@ bool contains(const Codes& codes, char32_t code) {
 bool holdsSteering(std::string_view text) {
     while (!text.empty()) {
         const auto [length, code] = firstUtf8Character(text);
-        const bool steers = contains(tags, code) || std::ranges::any_of(unseen, [code](const Codes& codes) {
-                                return contains(codes, code);
-                            });
-        if (length == 0 || steers) {
+        if (length == 0 || steers(code)) {
             return true;
         }
         text.remove_prefix(length);
