@@ -86,7 +86,9 @@ Failure noChange(const char* what) {
 }
 
 long long changeToUndo(Context& context) {
-    const auto found = candidates(context, [](const std::string& state) { return state != "undone"; });
+    const auto found = candidates(context, [](const std::string& state) {
+        return state != "undone" && state != "begun"; // of the latter nobody knows yet whether it was done
+    });
     return found.empty() ? throw noChange("to undo") : found.front();
 }
 

@@ -18,8 +18,8 @@ struct TakingBack {
     /// Fields that were changed again since, for good or by somebody else than this system.
     std::vector<std::string> kept;
 
-    /// Later changes that wait for a confirmation as well, with other fields: what they give back at their
-    /// own end is the value from before both.
+    /// Later changes of the same fields that wait for a confirmation as well, as they are to be recorded from
+    /// now on: taken back themselves, they give the value from before both.
     std::vector<ChangeRecord> rebased;
 };
 

@@ -82,6 +82,15 @@ TEST_F(HistoryTest, WhatIsNoIdIsRefusedInWords) {
     }
 }
 
+TEST_F(HistoryTest, AChangeThatMayNotBeDoneIsNotTheNewestToUndo) {
+    answer("GET /api/history?limit=100",
+           R"({"changes": [{"id": 15, "state": "begun"}, {"id": 14, "state": "undone"},
+               {"id": 13, "state": "done"}], "next": null})");
+    answer("POST /api/history/13/undo",
+           R"({"changes": [{"field": "/ftp/timeout", "from": 600, "to": 300}]})");
+    EXPECT_EQ(run({"undo"}).out, "ftp/timeout: 600 -> 300\n");
+}
+
 TEST_F(HistoryTest, OfSeveralThatWaitOneHasToBeNamed) {
     answer("GET /api/history?limit=100",
            R"({"changes": [{"id": 14, "state": "waiting"}, {"id": 13, "state": "done"},
