@@ -170,23 +170,16 @@ std::string joined(const std::vector<std::string>& fields) {
     return text;
 }
 
-/// What it changed is in force no more, or again; and the other way round what it undid, and so on.
-Result<> noteInForce(ChangeRecord change, bool inForce) {
-    VELT_RETURN_IF_ERROR(setChangeState(change.id, inForce ? ChangeState::done : ChangeState::undone));
-    while (const std::int64_t undone = undoneBy(change)) {
-        inForce = !inForce;
-        VELT_ASSIGN_OR_RETURN(auto former, changeRecord(undone));
-        if (!former) { // too old for the history
-            break;
-        }
-        VELT_RETURN_IF_ERROR(setChangeState(undone, inForce ? ChangeState::done : ChangeState::undone));
-        change = std::move(*former);
+/// What it changed is in force no more; so what it undid is in force again, and so on.
+Result<> noteUndone(const ChangeRecord& change) {
+    bool inForce = false;
+    for (std::optional<ChangeRecord> each = change; each; inForce = !inForce) {
+        VELT_RETURN_IF_ERROR(setChangeState(each->id, inForce ? ChangeState::done : ChangeState::undone));
+        const std::int64_t undone = undoneBy(*each);
+        // It may be too old for the history.
+        VELT_ASSIGN_OR_RETURN(each, undone == 0 ? std::optional<ChangeRecord>() : changeRecord(undone));
     }
     return {};
-}
-
-Result<> noteUndone(const ChangeRecord& change) {
-    return noteInForce(change, false);
 }
 
 /// Newest first; those that came after the change.
