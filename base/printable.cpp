@@ -1,25 +1,38 @@
 #include "base/printable.h"
 
 #include "base/text.h"
+#include "base/utf8.h"
+
+#include <algorithm>
 
 namespace velt {
 
 namespace {
 
-// Control characters below `c0End` and from DEL to U+009F, which is two bytes in UTF-8, as hexadecimal.
-std::string escapeControls(std::string_view text, unsigned char c0End, const std::string& prefix) {
+/// Which is hidden: C0 below `c0End`, DEL and C1.
+bool isControl(char32_t code, char32_t c0End) {
+    return code < c0End || (code >= 0x7F && code < 0xA0);
+}
+
+/// Line and paragraph separators, and what makes text after it run the other way (Unicode, UAX #9).
+bool rearranges(char32_t code) {
+    return (code >= 0x2028 && code <= 0x202E) || (code >= 0x2066 && code <= 0x2069);
+}
+
+std::string escape(std::string_view text, char32_t c0End, const std::string& controlPrefix) {
     std::string result;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        const auto byte = static_cast<unsigned char>(text[i]);
-        const auto next = i + 1 < text.size() ? static_cast<unsigned char>(text[i + 1]) : 0;
-        const bool c1 = byte == 0xC2 && next >= 0x80 && next < 0xA0;
-        if (c1) {
-            result += prefix + hexadecimal({&text[++i], 1});
-        } else if (byte < c0End || byte == 0x7F) {
-            result += prefix + hexadecimal({&text[i], 1});
+    while (!text.empty()) {
+        const Utf8Character character = firstUtf8Character(text);
+        const std::string_view piece = text.substr(0, std::max<std::size_t>(character.length, 1));
+        const bool isBareByte = character.length == 0 && c0End != 0;
+        if (isBareByte || (character.length != 0 && isControl(character.code, c0End))) {
+            result += controlPrefix + hexadecimal(piece.substr(piece.size() - 1));
+        } else if (character.length != 0 && rearranges(character.code)) {
+            result += "\\u20" + hexadecimal(std::string(1, static_cast<char>(character.code & 0xFFU)));
         } else {
-            result += text[i];
+            result += piece;
         }
+        text.remove_prefix(piece.size());
     }
     return result;
 }
@@ -27,11 +40,11 @@ std::string escapeControls(std::string_view text, unsigned char c0End, const std
 } // namespace
 
 std::string printable(std::string_view text) {
-    return escapeControls(text, 0x20, "\\x");
+    return escape(text, 0x20, "\\x");
 }
 
 std::string printableJson(const std::string& json) {
-    return escapeControls(json, 0, "\\u00");
+    return escape(json, 0, "\\u00");
 }
 
 } // namespace velt

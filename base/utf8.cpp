@@ -71,28 +71,27 @@ struct Codes {
     char32_t last;
 };
 
-constexpr std::array<Codes, 9> unseen{{{0x00, 0x1F},
-                                       {0x7F, 0x9F},
-                                       {0xAD, 0xAD},
-                                       {0x61C, 0x61C},
-                                       {0x180E, 0x180E},
-                                       {0x200B, 0x200F},
-                                       {0x2028, 0x206F},
-                                       {0xFEFF, 0xFEFF},
-                                       {0xFFF9, 0xFFFB}}};
-constexpr Codes tags{0xE0000, 0xE007F};
+// Control and private characters, what is ignored by default (Unicode, DerivedCoreProperties.txt), what has
+// no width or direction of its own, and what looks like a blank.
+constexpr std::array<Codes, 28> unseen{
+    {{0x00, 0x1F},       {0x7F, 0xA0},       {0xAD, 0xAD},       {0x34F, 0x34F},     {0x61C, 0x61C},
+     {0x115F, 0x1160},   {0x1680, 0x1680},   {0x17B4, 0x17B5},   {0x180B, 0x180F},   {0x2000, 0x200F},
+     {0x2028, 0x202F},   {0x205F, 0x206F},   {0x2800, 0x2800},   {0x3000, 0x3000},   {0x3164, 0x3164},
+     {0xE000, 0xF8FF},   {0xFE00, 0xFE0F},   {0xFEFF, 0xFEFF},   {0xFFA0, 0xFFA0},   {0xFFF0, 0xFFFB},
+     {0xFFFE, 0xFFFF},   {0x13430, 0x1343F}, {0x16FE4, 0x16FE4}, {0x1BCA0, 0x1BCA3}, {0x1D159, 0x1D159},
+     {0x1D173, 0x1D17A}, {0xE0000, 0xE0FFF}, {0xF0000, 0x10FFFF}}};
 
-bool steers(char32_t code) {
-    const auto holds = [code](const Codes& codes) { return code >= codes.first && code <= codes.last; };
-    return holds(tags) || std::ranges::any_of(unseen, holds);
+bool isUnseen(char32_t code) {
+    return std::ranges::any_of(
+        unseen, [code](const Codes& codes) { return code >= codes.first && code <= codes.last; });
 }
 
 } // namespace
 
-bool holdsSteering(std::string_view text) {
+bool holdsUnseen(std::string_view text) {
     while (!text.empty()) {
         const auto [length, code] = firstUtf8Character(text);
-        if (length == 0 || steers(code)) {
+        if (length == 0 || isUnseen(code)) {
             return true;
         }
         text.remove_prefix(length);

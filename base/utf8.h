@@ -18,10 +18,9 @@ Utf8Character firstUtf8Character(std::string_view text);
 /// The offset of the first byte that is not UTF-8, or npos.
 std::size_t findInvalidUtf8(std::string_view text);
 
-/// Whether a well-formed text holds characters that steer a terminal or a reader instead of being seen:
-/// control characters, and those of Unicode's category Cf (marks of direction, joiners, blanks of no width,
-/// tags).
-bool holdsSteering(std::string_view text);
+/// Whether a text holds bytes that are not UTF-8, or characters that cannot be seen, or look like a blank
+/// that is not U+0020: two texts that look the same could differ in them, and some turn the text around them.
+bool holdsUnseen(std::string_view text);
 
 } // namespace velt
 

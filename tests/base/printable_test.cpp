@@ -17,9 +17,22 @@ TEST(Printable, ControlCharactersCannotReachATerminal) {
 TEST(Printable, HalfACharacterTakesNoOtherAlong) {
     EXPECT_EQ(printable("\xC2"
                         "A\xC2"),
-              "\xC2"
-              "A\xC2");
-    EXPECT_EQ(printable("\xC2\x1b["), "\xC2\\x1b[");
+              "\\xc2A\\xc2");
+    EXPECT_EQ(printable("\xC2\x1b["), "\\xc2\\x1b[");
+    EXPECT_EQ(printable("a\x9b"
+                        "31m"),
+              "a\\x9b31m")
+        << "which a terminal without UTF-8 would obey";
+}
+
+TEST(Printable, NothingTurnsOrBreaksTheLine) {
+    // In pieces: they would turn this line, too.
+    const std::string begin = "\xE2\x80";
+    const std::string turn = begin + '\xAE';
+    const std::string isolate = std::string("\xE2\x81") + '\xA6';
+    EXPECT_EQ(printable("a" + turn + "b" + isolate + "c" + begin + '\xA8'), "a\\u202eb\\u2066c\\u2028");
+    EXPECT_EQ(printable("\xE2\x80\x94 \xE2\x80\xA6"), "\xE2\x80\x94 \xE2\x80\xA6");
+    EXPECT_EQ(printableJson("\"" + turn + "\""), "\"\\u202e\"");
 }
 
 TEST(Printable, JsonStaysJson) {

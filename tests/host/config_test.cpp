@@ -281,6 +281,13 @@ TEST(HostLog, NobodyWritesALineOfHisOwn) {
     velt::host::HostLog log([&line](const std::string& text) { line = text; });
     log.write("id", "a\nb\x1B[0m \xC3\xBC");
     EXPECT_EQ(line, "request=id a\\x0ab\\x1b[0m \xC3\xBC");
+    // Terminals obey some characters beyond ASCII, too, and viewers break lines at others.
+    const std::string begin = "\xE2\x80"; // apart from the rest, which would turn this line, too
+    for (const std::string& commanding : {std::string("\xC2\x85"), std::string("\xC2\x9B"), begin + '\xA8',
+                                          begin + '\xAE', std::string("\xE2\x81") + '\xA6'}) {
+        log.write("id", "a" + commanding + "b");
+        EXPECT_EQ(line.find(commanding), std::string::npos) << line;
+    }
 }
 
 } // namespace
