@@ -100,6 +100,9 @@ NewToken TokenStore::create(const std::string& name, Role role) {
     std::string text = "velt_" + randomHexadecimal(tokenBytes);
     Token token{randomHexadecimal(idBytes), name, role, timestamp(), sha256(text)};
     const std::lock_guard lock(mutex_);
+    if (std::ranges::find(tokens_, name, &Token::name) != tokens_.end()) {
+        throw TokenNameTaken();
+    }
     std::vector<Token> changed = tokens_;
     changed.push_back(token);
     store(changed);

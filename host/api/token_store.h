@@ -24,6 +24,15 @@ public:
     using std::runtime_error::runtime_error;
 };
 
+/// There is a token of that name already.
+class TokenNameTaken : public TokenError {
+public:
+    static constexpr const char* sentence =
+        "There is a token of this name. Delete it, or choose another name.";
+
+    TokenNameTaken() : TokenError(sentence) {}
+};
+
 struct Token {
     std::string id;
     std::string name;
@@ -47,7 +56,8 @@ public:
     /// and the host's own user could have written it: access is never guessed.
     explicit TokenStore(std::filesystem::path file);
 
-    /// Makes a token of 256 random bits. Throws TokenError, and makes none, when it cannot be stored.
+    /// Makes a token of 256 random bits. Throws TokenError, and makes none, when it cannot be stored, or
+    /// another one has its name.
     NewToken create(const std::string& name, Role role);
 
     /// False when there is no such token. Throws TokenError when the change cannot be stored.

@@ -17,11 +17,11 @@ namespace {
 constexpr std::size_t maxName = 64;
 constexpr const char* noneMade = " No token was created.";
 
-/// A name that is safe in logs: not empty, without characters that steer a terminal or turn the text around
-/// them.
+/// A name by which logs and people know the token: what can be seen, so that no two names look the same.
 bool isName(const Json::Value& value) {
     const std::string name = value.isString() ? value.asString() : "";
-    return !name.empty() && name.size() <= maxName && !holdsSteering(name);
+    return !name.empty() && name.size() <= maxName && !holdsUnseen(name) && name.front() != ' ' &&
+           name.back() != ' ' && name.find("  ") == std::string::npos;
 }
 
 HttpResponse list(const TokenStore& store) {
@@ -35,6 +35,35 @@ AuditEntry entryOf(AuditEvent event, const Token& token) {
     return {event, {token.name, roleName(token.role), token.id, {}}};
 }
 
+bool isTaken(const TokenStore& store, const std::string& name) {
+    const auto tokens = store.tokens();
+    return std::ranges::find(tokens, name, &Token::name) != tokens.end();
+}
+
+HttpResponse nameTaken(const Call& call) {
+    return problem(409, TokenNameTaken::sentence + std::string(noneMade), call.id);
+}
+
+struct WantedToken {
+    std::string name;
+    Role role = Role::viewer;
+};
+
+std::variant<WantedToken, FieldError> parseWanted(const Json::Value& body) {
+    const Json::Value& name = body["name"];
+    if (!isName(name)) {
+        return FieldError{
+            "name",
+            "a string of 1 to 64 bytes of characters that can be seen, with single blanks between them"};
+    }
+    const Json::Value& word = body["role"];
+    const auto role = word.isString() ? roleNamed(word.asString()) : std::nullopt;
+    if (!role) {
+        return FieldError{"role", "\"admin\" or \"viewer\""};
+    }
+    return WantedToken{name.asString(), *role};
+}
+
 HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     const auto dryRun = parseDryRun(call.request.query());
     if (const auto* const bad = std::get_if<FieldError>(&dryRun)) {
@@ -44,22 +73,25 @@ HttpResponse create(TokenStore& store, HostLog& log, const Call& call) {
     if (!body) {
         return notAnObject(body.error(), noneMade, call.id);
     }
-    const Json::Value& name = (*body)["name"];
-    if (!isName(name)) {
-        return fieldProblem(422, {"name", "a string of 1 to 64 bytes of characters that can be seen"},
-                            noneMade, call.id);
+    const auto parsed = parseWanted(*body);
+    if (const auto* const bad = std::get_if<FieldError>(&parsed)) {
+        return fieldProblem(422, *bad, noneMade, call.id);
     }
-    const Json::Value& word = (*body)["role"];
-    const auto role = word.isString() ? roleNamed(word.asString()) : std::nullopt;
-    if (!role) {
-        return fieldProblem(422, {"role", "\"admin\" or \"viewer\""}, noneMade, call.id);
-    }
+    const auto& [name, role] = std::get<WantedToken>(parsed);
     if (std::get<bool>(dryRun)) {
-        return dryRunAnswer(
-            {{StepKind::store, "tokens"},
-             stepOf(entryOf(AuditEvent::tokenMade, {"not known yet", name.asString(), *role, {}, {}}))});
+        return isTaken(store, name)
+                   ? nameTaken(call)
+                   : dryRunAnswer(
+                         {{StepKind::store, "tokens"},
+                          stepOf(entryOf(AuditEvent::tokenMade, {"not known yet", name, role, {}, {}}))});
     }
-    const auto [token, text] = store.create(name.asString(), *role);
+    NewToken made;
+    try {
+        made = store.create(name, role);
+    } catch (const TokenNameTaken&) {
+        return nameTaken(call);
+    }
+    const auto& [token, text] = made;
     log.write(call.id, "token " + token.id + " created for " + token.name + " (" + roleName(token.role) +
                            ") by " + call.principal.actor);
     writeAudit(entryOf(AuditEvent::tokenMade, token), log, call);

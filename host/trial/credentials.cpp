@@ -15,6 +15,7 @@ namespace velt::host {
 namespace {
 
 constexpr const char* tokenName = "token";
+constexpr const char* tokenUse = "quick-start";
 constexpr const char* environmentName = "env";
 
 /// The text as one word of a shell.
@@ -48,7 +49,13 @@ std::optional<std::string> storedToken() {
 }
 
 std::string makeToken() {
-    std::string token = TokenStore(tokenFileName).create("quick-start", Role::admin).text;
+    TokenStore store(tokenFileName);
+    for (const Token& lost : store.tokens()) {
+        if (lost.name == tokenUse) {
+            (void)store.remove(lost.id);
+        }
+    }
+    std::string token = store.create(tokenUse, Role::admin).text;
     check(replaceFile(tokenName, token + "\n", 0600));
     return token;
 }

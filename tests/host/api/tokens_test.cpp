@@ -96,23 +96,56 @@ TEST_F(HostTokens, OnlyATokensOwnPathRemovesIt) {
 
 TEST_F(HostTokens, ATokenNeedsANameAndARole) {
     start();
-    for (const char* body :
-         {"{}", R"({"name":"x"})", R"({"name":"","role":"admin"})", R"({"name":7,"role":"admin"})",
-          R"({"name":"x","role":"root"})", R"({"name":"a\nb","role":"admin"})",
-          R"({"name":"a\u007f","role":"admin"})", R"({"name":"\u0080","role":"admin"})",
-          R"({"name":"a\u009bb","role":"admin"})", R"({"name":"\u202a","role":"admin"})",
-          R"({"name":"a\u202eb","role":"admin"})", R"({"name":"a\u200bb","role":"admin"})",
-          R"({"name":"a\u00adb","role":"admin"})", R"({"name":"a\u061cb","role":"admin"})",
-          R"({"name":"\ufeffa","role":"admin"})", R"({"name":"a\udb40\udc41","role":"admin"})",
-          R"({"name":"\u2066","role":"admin"})", R"({"name":"a\u2069","role":"admin"})"}) {
+    for (const char* body : {"{}",
+                             R"({"name":"x"})",
+                             R"({"name":"","role":"admin"})",
+                             R"({"name":7,"role":"admin"})",
+                             R"({"name":"x","role":"root"})",
+                             R"({"name":"a\nb","role":"admin"})",
+                             R"({"name":"a\u007f","role":"admin"})",
+                             R"({"name":"\u0080","role":"admin"})",
+                             R"({"name":"a\u009bb","role":"admin"})",
+                             R"({"name":"\u202a","role":"admin"})",
+                             R"({"name":"a\u202eb","role":"admin"})",
+                             R"({"name":"a\u200bb","role":"admin"})",
+                             R"({"name":"a\u00adb","role":"admin"})",
+                             R"({"name":"a\u061cb","role":"admin"})",
+                             R"({"name":"\ufeffa","role":"admin"})",
+                             R"({"name":"a\udb40\udc41","role":"admin"})",
+                             R"({"name":"\u2066","role":"admin"})",
+                             R"({"name":"a\u2069","role":"admin"})",
+                             R"({"name":"\u3164","role":"admin"})",
+                             R"({"name":"a\u115f","role":"admin"})",
+                             R"({"name":"a\u2800b","role":"admin"})",
+                             R"({"name":"a\u034fb","role":"admin"})",
+                             R"({"name":"a\ufe0f","role":"admin"})",
+                             R"({"name":"a\udb40\udd00","role":"admin"})",
+                             R"({"name":"a\u00a0b","role":"admin"})",
+                             R"({"name":"\u200a","role":"admin"})",
+                             R"({"name":" ","role":"admin"})",
+                             R"({"name":" a","role":"admin"})",
+                             R"({"name":"a ","role":"admin"})",
+                             R"({"name":"a  b","role":"admin"})"}) {
         EXPECT_EQ(post("/api/tokens", body).status, 422) << body;
     }
     EXPECT_EQ(post("/api/tokens", "[").status, 400);
     EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 2U);
-    for (const char* body : {R"({"name":"\u00a0\u200a\u2010\u2027\u2070","role":"admin"})",
+    for (const char* body : {R"({"name":"\u2010\u2027 \u2070","role":"admin"})",
                              R"({"name":"Zo\u00eb, \u05d0","role":"admin"})"}) {
         EXPECT_EQ(post("/api/tokens", body).status, 201) << body;
     }
+}
+
+TEST_F(HostTokens, NoTwoTokensHaveOneName) {
+    start();
+    const std::string body = R"({"name":"bench","role":"viewer"})";
+    ASSERT_EQ(post("/api/tokens", body).status, 201);
+    EXPECT_EQ(post("/api/tokens?dry_run=true", body).status, 409);
+    const Answer again = post("/api/tokens", body);
+    EXPECT_EQ(again.status, 409);
+    EXPECT_EQ(again.json()["detail"], "There is a token of this name. Delete it, or choose another name. "
+                                      "No token was created.");
+    EXPECT_EQ(get("/api/tokens").json()["tokens"].size(), 3U) << "two of the test's own";
 }
 
 TEST_F(HostTokens, OnlyHashesOfTokensAreStored) {
