@@ -58,6 +58,10 @@ std::unique_ptr<Context> makeTlsContext(const TlsFiles& files) {
     if (!error) {
         context->use_private_key(boost::asio::buffer(key), Context::pem, error);
     }
+    if (!error && SSL_CTX_check_private_key(context->native_handle()) != 1) {
+        throw ListenError("The key " + files.key.string() + " does not belong to the TLS certificate " +
+                          files.certificate.string() + ".");
+    }
     if (error) {
         throw ListenError("Cannot use the TLS certificate " + files.certificate.string() + " with the key " +
                           files.key.string() + ": " + error.message() + ".");

@@ -20,6 +20,11 @@ namespace {
 
 template<class T> using Owner = std::unique_ptr<T, void (*)(T*)>;
 
+void writeKey(EVP_PKEY* key, const std::filesystem::path& path) {
+    const Owner<std::FILE> file(std::fopen(path.c_str(), "w"), [](std::FILE* open) { std::fclose(open); });
+    PEM_write_PrivateKey(file.get(), key, nullptr, nullptr, 0, nullptr, nullptr);
+}
+
 /// Writes a self-signed certificate and its key.
 void makeCertificate(const velt::host::TlsFiles& files) {
     const Owner<EVP_PKEY> key(EVP_EC_gen("P-256"), EVP_PKEY_free);
@@ -36,9 +41,7 @@ void makeCertificate(const velt::host::TlsFiles& files) {
     const Owner<std::FILE> certificateFile(std::fopen(files.certificate.c_str(), "w"),
                                            [](std::FILE* file) { std::fclose(file); });
     PEM_write_X509(certificateFile.get(), certificate.get());
-    const Owner<std::FILE> keyFile(std::fopen(files.key.c_str(), "w"),
-                                   [](std::FILE* file) { std::fclose(file); });
-    PEM_write_PrivateKey(keyFile.get(), key.get(), nullptr, nullptr, 0, nullptr, nullptr);
+    writeKey(key.get(), files.key);
     std::filesystem::permissions(files.key, std::filesystem::perms::owner_read);
 }
 
@@ -127,6 +130,17 @@ TEST_F(HostTls, FilesThatCannotBeUsedStopTheStart) {
     std::ofstream(tls.key) << "no key";
     EXPECT_THROW(start(), velt::host::ListenError);
     app.reset();
+}
+
+TEST_F(HostTls, AKeyOfAnotherCertificateStopsTheStart) {
+    std::filesystem::permissions(tls.key, std::filesystem::perms::owner_all);
+    const Owner<EVP_PKEY> ofOneKind(EVP_EC_gen("P-256"), EVP_PKEY_free);
+    const Owner<EVP_PKEY> ofAnother(EVP_RSA_gen(2048), EVP_PKEY_free);
+    for (EVP_PKEY* const key : {ofOneKind.get(), ofAnother.get()}) {
+        writeKey(key, tls.key);
+        EXPECT_THROW(start(), velt::host::ListenError);
+        app.reset();
+    }
 }
 
 TEST_F(HostTls, AKeyThatOthersMayReadOrWriteStopsTheStart) {
