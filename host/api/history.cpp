@@ -170,11 +170,13 @@ std::string joined(const std::vector<std::string>& fields) {
     return text;
 }
 
-/// What it changed is in force no more; so what it undid is in force again, and so on.
-Result<> noteUndone(const ChangeRecord& change) {
+/// What it changed is in force no more; so what it undid is in force again, and so on. Where nobody asked for
+/// that, what nobody had confirmed still waits until its deadline.
+Result<> noteUndone(const ChangeRecord& change, bool asked) {
     bool inForce = false;
     for (std::optional<ChangeRecord> each = change; each; inForce = !inForce) {
-        VELT_RETURN_IF_ERROR(setChangeState(each->id, inForce ? ChangeState::done : ChangeState::undone));
+        const ChangeState again = each->confirmBy && !asked ? ChangeState::waiting : ChangeState::done;
+        VELT_RETURN_IF_ERROR(setChangeState(each->id, inForce ? again : ChangeState::undone));
         const std::int64_t undone = undoneBy(*each);
         // It may be too old for the history.
         VELT_ASSIGN_OR_RETURN(each, undone == 0 ? std::optional<ChangeRecord>() : changeRecord(undone));
@@ -264,7 +266,7 @@ HttpResponse History::undo(const Call& call) {
     HttpResponse response =
         settings_.store(*current, wanted, "undo " + call.path[2], std::get<ChangeOptions>(options), call);
     if (response.status == 200 && !std::get<ChangeOptions>(options).dryRun) {
-        if (const auto noted = noteUndone(*record); !noted) {
+        if (const auto noted = noteUndone(*record, true); !noted) {
             log_.write(call.id, noted.error().message);
         }
     }
@@ -338,7 +340,7 @@ bool History::noteTakenBack(const ChangeRecord& change, const TakingBack& back) 
     }
     const std::string but = kept.empty() ? "" : ", but for " + kept + ", changed again since";
     const auto logged = writeAudit({AuditEvent::takenBack, {id, but, {}, {}}});
-    return logged && noteUndone(change);
+    return logged && noteUndone(change, false);
 }
 
 void History::settleBegun() {

@@ -199,7 +199,9 @@ Result<> checkHistoryCanBeWritten() {
 
 Result<> setChangeState(std::int64_t id, ChangeState state) {
     VELT_ASSIGN_OR_RETURN(auto history, History::open());
-    return history.run("UPDATE change SET state = ?2 WHERE id = ?1", {id, static_cast<std::int64_t>(state)});
+    return history.run(
+        "UPDATE change SET state = ?2, confirm_by = iif(?2 = ?3, NULL, confirm_by) WHERE id = ?1",
+        {id, static_cast<std::int64_t>(state), static_cast<std::int64_t>(ChangeState::confirmed)});
 }
 
 Result<> setChangeFields(std::int64_t id, const std::string& fields) {

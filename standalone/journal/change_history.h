@@ -33,7 +33,8 @@ struct ChangeRecord {
     std::string way;    ///< what was used: "settings", a method's name, "undo 12"
     std::string fields; ///< what changed, as its host wrote it
     ChangeState state = ChangeState::done;
-    std::optional<std::chrono::system_clock::time_point> confirmBy; ///< of one that waits, or did
+    std::optional<std::chrono::system_clock::time_point>
+        confirmBy; ///< of one that waits, or was not confirmed
 };
 
 struct ChangeFilter {
@@ -55,7 +56,8 @@ Result<std::int64_t> recordChange(const ChangeRecord& change);
 /// Whether a change could be written down now, other than for a full disk.
 Result<> checkHistoryCanBeWritten();
 
-/// What became of the change. No error when it is not kept any more.
+/// What became of the change. One that is confirmed has no deadline any more. No error when it is not kept
+/// any more.
 Result<> setChangeState(std::int64_t id, ChangeState state);
 
 /// Gives the change other fields. No error when it is not kept any more.

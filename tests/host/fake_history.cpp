@@ -41,6 +41,9 @@ Result<> setChangeState(std::int64_t id, ChangeState state) {
     const auto found = std::ranges::find(fake.history, id, &ChangeRecord::id);
     if (found != fake.history.end()) {
         found->state = state;
+        if (state == ChangeState::confirmed) {
+            found->confirmBy.reset();
+        }
     }
     return {};
 }

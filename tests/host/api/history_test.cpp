@@ -172,6 +172,25 @@ TEST_F(HostHistory, UnconfirmedChangesOnEachOtherAreAllTakenBack) {
     EXPECT_EQ(get("/api/history/1").json()["state"], "superseded");
 }
 
+TEST_F(HostHistory, AnUndoingThatNobodyConfirmsLeavesItsChangeItsOwnDeadline) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=2").status, 200);
+    ASSERT_EQ(post("/api/history/1/undo?confirm_within=1").status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/2").json()["state"] == "undone"; },
+                                      velt::test::patience));
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "undone"; },
+                                      velt::test::patience));
+    EXPECT_EQ(timeOut(), 300) << "nobody confirmed 600";
+}
+
+TEST_F(HostHistory, AnUndoingThatNobodyConfirmsLeavesAConfirmedChange) {
+    ASSERT_EQ(setTimeOut(600, "?confirm_within=60").status, 200);
+    ASSERT_EQ(post("/api/history/1/confirm").status, 204);
+    ASSERT_EQ(post("/api/history/1/undo?confirm_within=1").status, 200);
+    EXPECT_TRUE(velt::test::waitUntil([&] { return get("/api/history/1").json()["state"] == "done"; },
+                                      velt::test::patience));
+    EXPECT_EQ(timeOut(), 600);
+}
+
 TEST_F(HostHistory, OfTwoUnconfirmedChangesTheConfirmedOneStays) {
     ASSERT_EQ(setTimeOut(600, "?confirm_within=1").status, 200);
     ASSERT_EQ(setTimeOut(700, "?confirm_within=60").status, 200);

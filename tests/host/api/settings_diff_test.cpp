@@ -65,10 +65,9 @@ TEST_F(HostDiff, OfALongHistoryAllPagesAreTakenBack) {
     const Json::Value first = document();
     for (int i = 1; i <= 1500; ++i) {
         velt::ChangeRecord change;
-        change.id = i;
         change.fields = R"([{"field":"/ftp/timeout","from":)" + std::to_string(300 + i - 1) + R"(,"to":)" +
                         std::to_string(300 + i) + "}]";
-        access.history.push_back(change);
+        ASSERT_TRUE(velt::recordChange(change)); // under its lock: the host looks at the history by itself
     }
     fake::Platform::instance().timeout = 1800;
     EXPECT_EQ(documentAt(0), first);
