@@ -1,9 +1,9 @@
 // What the platform library offers the program that loads the module over it, beside the contract.
 //
 // A host, at its start: openState, the subscriptions, undoUnfinishedChange, startServicesAtBoot,
-// watchServices. Then, for each request, on the thread that serves it: setRequestActor, clearLastError,
-// around one that changes something a SettingsChange, the module's entry function, and after a failure
-// lastErrorSentence or lastPortConflict for the answer.
+// watchServices, startActivityReader. Then, for each request, on the thread that serves it: setRequestActor,
+// clearLastError, around one that changes something a SettingsChange, the module's entry function, and after
+// a failure lastErrorSentence or lastPortConflict for the answer.
 //
 // Unless it says otherwise a function may be called from any thread.
 #ifndef VELT_STANDALONE_STANDALONE_H
@@ -33,8 +33,16 @@
 #include "standalone/journal/request_actor.h"
 #include "standalone/journal/subscriptions.h"
 
+// Who is logged in, what sessions did and do.
+#include "standalone/activity/activity_reader.h"
+#include "standalone/activity/operation_search.h"
+#include "standalone/control/open_sessions.h"
+
 // The chroot rules that a module cannot name.
 #include "standalone/rules/unnamed_rules.h"
+
+// What the logins of an account would see.
+#include "standalone/login/access_report.h"
 
 // Who is refused for a while after too many failed logins.
 #include "standalone/bans/login_guard.h"

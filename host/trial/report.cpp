@@ -33,7 +33,7 @@ void printProblems(const std::vector<ServiceDown>& down) {
             stderr,
             "FTP will not start here: as root it confines sessions by mounts, which this machine does "
             "not allow. A container\nneeds the capability SYS_ADMIN for that; or start as an ordinary "
-            "user.\n");
+            "user. SFTP starts, and shows its users the whole\nserver.\n");
     }
     if (!down.empty()) {
         std::fprintf(stderr, "%s\n", sentenceOf(down).c_str());

@@ -38,13 +38,14 @@ namespace {
 constexpr const char* logName = "veltd.log";
 constexpr const char* socketName = "run/velt/veltd.sock";
 constexpr const char* moduleName = "VELT.Core.FileServ.FTP.so";
-constexpr std::array<const char*, 7> programNames{"veltd",
+constexpr std::array<const char*, 8> programNames{"veltd",
                                                   "veltctl",
                                                   "velt-supervise",
                                                   "velt-login-view",
                                                   moduleName,
                                                   "libvelt-standalone.so",
-                                                  "mod_velt_login.so"};
+                                                  "mod_velt_login.so",
+                                                  "velt-sftp-session.so"};
 constexpr int firstHttpPort = 8080;
 constexpr int lastHttpPort = 8099;
 

@@ -1,5 +1,7 @@
 #include "standalone/control/change_settings.h"
 
+#include "standalone/control/daemon_control.h"
+#include "standalone/control/supervised_daemon.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/paths.h"
@@ -8,6 +10,8 @@
 #include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "standalone/settings/settings_store.h"
+
+#include <tuple>
 
 namespace velt {
 
@@ -49,10 +53,31 @@ Result<> storeExternalAddress(const FtpSettings& settings) {
     });
 }
 
+/// What of FTP's settings the configuration of SFTP follows from, too.
+auto sharedWithSftp(const FtpSettings& settings) {
+    return std::make_tuple(settings.umask, settings.fipsOnly);
+}
+
+/// The listener of a running SFTP service gives way to one with the settings as they are now; its sessions go
+/// on.
+Result<> followWithSftp() {
+    if (!isServing(daemonState(sftpDaemon))) {
+        return {};
+    }
+    return perform(Effect::start, sftpDaemon.name, [] { return startDaemon(sftpDaemon); });
+}
+
 } // namespace
 
 Result<> changeFtpSettings(const std::function<void(FtpSettings&)>& change) {
-    return changeStored<FtpSettings>(loadFtpSettings, change, storeFtpSettings);
+    bool concernsSftp = false;
+    const auto noted = [&](FtpSettings& settings) {
+        const auto before = sharedWithSftp(settings);
+        change(settings);
+        concernsSftp = sharedWithSftp(settings) != before;
+    };
+    VELT_RETURN_IF_ERROR(changeStored<FtpSettings>(loadFtpSettings, noted, storeFtpSettings));
+    return concernsSftp ? followWithSftp() : Result<>();
 }
 
 Result<> changeSftpSettings(const std::function<void(SftpSettings&)>& change) {

@@ -38,6 +38,9 @@ Findings changeFindings();
 /// nevertheless.
 Findings journalFindings(TimePoint now);
 
+/// What sessions did and nobody can look up: records that were lost, or that cannot be taken over.
+Findings activityFindings(TimePoint now);
+
 /// Services that run, and do not greet or take up TLS as their clients expect, or serve a certificate other
 /// than the stored one.
 Findings greetingFindings();
@@ -47,6 +50,9 @@ Findings replacedProgramFindings();
 
 /// The certificate of FTPS: whether it fits its key, and when it is valid. Nothing while FTPS is off.
 Findings certificateFindings(TimePoint now);
+
+/// SFTP that is on and not confined.
+Findings confinementFindings();
 
 /// The files of the shares and of the chroot rules, and the accounts that they name.
 Findings fileFindings();

@@ -44,6 +44,7 @@ Findings judgeHealth() {
     static constexpr std::array checks{
         Check{changeFindings},
         Check{[] { return journalFindings(std::chrono::system_clock::now()); }},
+        Check{[] { return activityFindings(std::chrono::system_clock::now()); }},
         Check{serviceFindings},
         Check{programFindings},
         Check{settingsFileFindings},
@@ -53,6 +54,7 @@ Findings judgeHealth() {
         Check{fileFindings},
         Check{ruleShareFindings},
         Check{anonymousFindings},
+        Check{confinementFindings},
         Check{firewallFindings},
         Check{passiveRangeFindings},
         Check{externalAddressFindings},

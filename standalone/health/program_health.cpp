@@ -3,6 +3,7 @@
 #include "standalone/daemons/daemon.h"
 #include "standalone/health/checks.h"
 #include "standalone/health/mends.h"
+#include "standalone/settings/confinement_settings.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -23,13 +24,16 @@ struct Part {
     const char* file;
     int use; ///< X_OK: it is run; R_OK: it is read
     const char* consequence;
+    bool confines = false; ///< needed only where SFTP is confined
 };
 
-constexpr std::array<Part, 5> parts{{
+constexpr std::array<Part, 7> parts{{
     {"ftp", "velt-login-view", X_OK, "Nobody can log in over FTP."},
     {"ftp", "mod_velt_login.so", R_OK, "FTP cannot be started again."},
     {"ftp", "velt-supervise", X_OK, "FTP cannot be started again."},
     {"sftp", "velt-authorized-keys", X_OK, "Nobody can log in over SFTP with a key."},
+    {"sftp", "velt-login-view", X_OK, "Nobody can log in over SFTP while it is confined.", true},
+    {"sftp", "velt-sftp-session.so", R_OK, "SFTP cannot be started again while it is confined.", true},
     {"sftp", "velt-supervise", X_OK, "SFTP cannot be started again."},
 }};
 
@@ -76,12 +80,17 @@ bool isSwitchedOn(std::string_view service) {
     return settings && settings->enabled();
 }
 
+bool sftpIsConfined() {
+    const auto settings = loadConfinementSettings();
+    return settings && settings->sftp && ::geteuid() == 0;
+}
+
 } // namespace
 
 Findings programFindings() {
     Findings findings;
     for (const Part& part : parts) {
-        if (isSwitchedOn(part.service)) {
+        if (isSwitchedOn(part.service) && (!part.confines || sftpIsConfined())) {
             if (auto found = judge(part)) {
                 findings.push_back(std::move(*found));
             }

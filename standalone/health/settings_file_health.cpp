@@ -1,3 +1,4 @@
+#include "standalone/activity/activity_settings.h"
 #include "standalone/bans/ban_settings.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
@@ -5,6 +6,7 @@
 #include "standalone/health/mends.h"
 #include "standalone/journal/log_retention.h"
 #include "standalone/ports/known_services.h"
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/settings/settings.h"
 
 namespace velt {
@@ -42,10 +44,14 @@ Findings settingsFileFindings() {
     judgeValues(paths::sftpSettings, "sftp", "SFTP", loadSftpSettings(), checkSftpSettings, findings);
     const std::string noChange = "No service can be started, and no setting of theirs can be changed.";
     judge(paths::networkSettings, "settings", loadNetworkSettings(), noChange, findings);
+    judge(paths::confinementSettings, "sftp", loadConfinementSettings(), "SFTP cannot be started again.",
+          findings);
     judge(paths::banSettings, "settings", loadBanSettings(),
           "Until then failed logins are counted as without this file.", findings);
     judge(paths::knownServices, "settings", loadKnownServices(), "No port of a service can be changed.",
           findings);
+    judge(paths::activitySettings, "sessions", loadActivitySettings(),
+          "No record of what sessions did is removed.", findings);
     judge(paths::logRetention, "log", loadRetention(), "No entry of the log is removed.", findings);
     return findings;
 }

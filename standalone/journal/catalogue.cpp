@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 36> entries{{
+constexpr std::array<CatalogueEntry, 38> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -45,12 +45,14 @@ constexpr std::array<CatalogueEntry, 36> entries{{
     {0x11BF0009, "The change of the settings (%1) failed and could be taken back only in part: %2."},
     {0x11BF000A,
      "The change %1 was not confirmed in time, but nothing was taken back: %2 changed again since."},
+    {0x11BF000B, "The session %1 of \"%2\" from %3 was ended%4."},
     {0x11BF0010, "The %1 service ended unexpectedly: %2."},
     {0x11BF0011, "The %1 service runs again."},
     {0x11BF0012, "The %1 service was started by another program."},
     {0x11BF0013, "The %1 service was stopped by another program."},
     {0x11BF0014, "The %1 service is on, but could not be started: %2."},
     {0x11BF0015, "The administrator log begins here: its former file was moved away or deleted."},
+    {0x11BF0016, "A login of \"%2\" over %1 was refused: %3."},
 }};
 
 std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4>& texts) {

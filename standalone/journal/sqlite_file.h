@@ -1,4 +1,4 @@
-// The file of the journal's database, and connections to it.
+// The files of databases, and connections to them.
 #ifndef VELT_STANDALONE_JOURNAL_SQLITE_FILE_H
 #define VELT_STANDALONE_JOURNAL_SQLITE_FILE_H
 
@@ -16,12 +16,16 @@ struct CloseDatabase {
 };
 using DatabaseOwner = std::unique_ptr<sqlite3, CloseDatabase>;
 
-/// Opens the file, which is made when it is missing, readable for its owner only. Waits for other writers for
-/// some seconds. Not for two threads at once.
-Result<DatabaseOwner> openDatabase(const std::filesystem::path& path);
+/// How sentences about the journal's database begin.
+inline constexpr const char* administratorLog = "The administrator log";
 
-/// An error of the administrator log: "The administrator log PATH cannot be opened: REASON."
-Error databaseError(sqlite3* database, const std::filesystem::path& path, const char* what);
+/// Opens the file, which is made when it is missing, readable for its owner only. Waits for other writers for
+/// some seconds. `title` begins the sentence of an error. Not for two threads at once.
+Result<DatabaseOwner> openDatabase(const std::filesystem::path& path, const char* title = administratorLog);
+
+/// "The administrator log PATH cannot be opened: REASON."
+Error databaseError(sqlite3* database, const std::filesystem::path& path, const char* what,
+                    const char* title = administratorLog);
 
 int execute(sqlite3* database, const char* sql);
 

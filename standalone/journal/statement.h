@@ -41,6 +41,7 @@ public:
     /// Runs it to its end and makes it ready again. SQLITE_DONE, or what went wrong.
     int run();
 
+    bool isNull(int column) { return sqlite3_column_type(statement_, column) == SQLITE_NULL; }
     std::int64_t number(int column) { return sqlite3_column_int64(statement_, column); }
     std::string text(int column);
 

@@ -19,6 +19,8 @@ static const char* const file_names[file_count] = {"shares.json", "chroot_rules"
 /* What tells whether the file is still the same, and still there: its times change with its content, and with
  * its name. */
 struct version {
+    dev_t device;
+    ino_t number;
     nlink_t names;
     off_t size;
     struct timespec written;
@@ -26,13 +28,14 @@ struct version {
 };
 
 struct noted {
-    int file; /* -1: there was none */
+    int file; /* open, so that no other gets its number; -1: there was none */
     struct version version;
 };
 
 static int folder = -1;
 static char folder_path[PATH_MAX];
-static struct noted noted[file_count] = {{-1, {0, 0, {0, 0}, {0, 0}}}, {-1, {0, 0, {0, 0}, {0, 0}}}};
+static struct noted noted[file_count] = {{-1, {0, 0, 0, 0, {0, 0}, {0, 0}}},
+                                         {-1, {0, 0, 0, 0, {0, 0}, {0, 0}}}};
 
 static void forget(int* file) {
     if (*file >= 0) {
@@ -46,16 +49,22 @@ static int is_same_time(struct timespec one, struct timespec other) {
 }
 
 static int is_same(const struct version* one, const struct version* other) {
-    return one->names == other->names && one->size == other->size &&
-           is_same_time(one->written, other->written) && is_same_time(one->changed, other->changed);
+    return one->device == other->device && one->number == other->number && one->names == other->names &&
+           one->size == other->size && is_same_time(one->written, other->written) &&
+           is_same_time(one->changed, other->changed);
 }
 
-static int look(int file, struct version* found) {
+/* What has the name now, also where something has been mounted over it. Where the user may not look into the
+ * folder, the file that is known has to do. */
+static int look(const char* name, int file, struct version* found) {
     struct stat status;
 
-    if (fstat(file, &status) < 0) {
+    if (fstatat(folder, name, &status, AT_SYMLINK_NOFOLLOW) < 0 &&
+        (errno != EACCES || fstat(file, &status) < 0)) {
         return -1;
     }
+    found->device = status.st_dev;
+    found->number = status.st_ino;
     found->names = status.st_nlink;
     found->size = status.st_size;
     found->written = status.st_mtim;
@@ -68,7 +77,7 @@ static int note(const char* name, struct noted* one) {
     if (one->file < 0) {
         return errno == ENOENT ? 0 : -1;
     }
-    return look(one->file, &one->version);
+    return look(name, one->file, &one->version);
 }
 
 int velt_note_access_files(const char* state_root) {
@@ -100,7 +109,7 @@ static int is_unchanged(const char* name, const struct noted* one) {
     if (one->file < 0) {
         return fstatat(folder, name, &status, AT_SYMLINK_NOFOLLOW) < 0 && errno == ENOENT;
     }
-    return look(one->file, &now) == 0 && is_same(&now, &one->version);
+    return look(name, one->file, &now) == 0 && is_same(&now, &one->version);
 }
 
 /* The files of a folder that was exchanged stay as they were, but nobody reads them any more. Its own times
@@ -123,4 +132,18 @@ int velt_access_files_changed(void) {
         }
     }
     return 0;
+}
+
+size_t velt_access_descriptors(int* descriptors, size_t most) {
+    size_t count = 0;
+
+    if (folder >= 0 && count < most) {
+        descriptors[count++] = folder;
+    }
+    for (int i = 0; i < file_count && count < most; i++) {
+        if (noted[i].file >= 0) {
+            descriptors[count++] = noted[i].file;
+        }
+    }
+    return count;
 }

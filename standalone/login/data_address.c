@@ -1,9 +1,13 @@
 #include "standalone/login/data_address.h"
 
 #include <arpa/inet.h>
-#include <ifaddrs.h>
+#include <errno.h>
+#include <linux/netlink.h>
+#include <linux/rtnetlink.h>
 #include <stdint.h>
 #include <string.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 static void map(uint32_t ipv4, struct in6_addr* address) {
     memset(address, 0, sizeof(*address));
@@ -84,52 +88,102 @@ static int is_special(const struct in6_addr* address) {
            IN6_IS_ADDR_LINKLOCAL(address) || IN6_IS_ADDR_MULTICAST(address);
 }
 
-/* The address to which a gateway would translate this one: RFC 6052 (NAT64), RFC 3056 (6to4). */
-static struct in6_addr translated(const struct in6_addr* address) {
-    static const uint8_t nat64[12] = {0x00, 0x64, 0xff, 0x9b};
-    struct in6_addr plain = *address;
+/* An IPv4 address within an IPv6 one. */
+struct form {
+    uint8_t prefix[12];
+    size_t prefix_size;
+    size_t place; /* of the four octets */
+    uint8_t mask; /* that they are hidden with */
+};
+
+/* To which a gateway, or the kernel itself, would translate: RFC 6052 and 8215 (NAT64), RFC 3056 (6to4), RFC
+ * 4380 (Teredo: the client, and the server), RFC 2765 (SIIT). */
+static const struct form forms[] = {
+    {{0x00, 0x64, 0xff, 0x9b}, 12, 12, 0},
+    {{0x00, 0x64, 0xff, 0x9b, 0x00, 0x01}, 6, 12, 0},
+    {{0x20, 0x02}, 2, 2, 0},
+    {{0x20, 0x01, 0x00, 0x00}, 4, 12, 0xff},
+    {{0x20, 0x01, 0x00, 0x00}, 4, 4, 0},
+    {{0, 0, 0, 0, 0, 0, 0, 0, 0xff, 0xff, 0, 0}, 12, 12, 0},
+};
+
+/* True when the address has this form. */
+static int translate(const struct form* form, const struct in6_addr* address, struct in6_addr* plain) {
     uint32_t ipv4 = 0;
 
-    if (memcmp(address->s6_addr, nat64, sizeof(nat64)) == 0) {
-        memcpy(&ipv4, address->s6_addr + 12, sizeof(ipv4));
-        map(ntohl(ipv4), &plain);
-    } else if (address->s6_addr[0] == 0x20 && address->s6_addr[1] == 0x02) {
-        memcpy(&ipv4, address->s6_addr + 2, sizeof(ipv4));
-        map(ntohl(ipv4), &plain);
-    }
-    return plain;
-}
-
-static int is_at(const struct in6_addr* address, const struct sockaddr* interface) {
-    struct in6_addr own;
-
-    if (interface == NULL) {
+    if (memcmp(address->s6_addr, form->prefix, form->prefix_size) != 0) {
         return 0;
     }
-    if (interface->sa_family == AF_INET) {
-        map(ntohl(((const struct sockaddr_in*)(const void*)interface)->sin_addr.s_addr), &own);
-    } else if (interface->sa_family == AF_INET6) {
-        own = ((const struct sockaddr_in6*)(const void*)interface)->sin6_addr;
-    } else {
-        return 0;
+    for (size_t i = 0; i < sizeof(ipv4); i++) {
+        ipv4 = ipv4 << 8 | (uint8_t)(address->s6_addr[form->place + i] ^ form->mask);
     }
-    return IN6_ARE_ADDR_EQUAL(address, &own);
+    map(ipv4, plain);
+    return 1;
 }
 
-int velt_is_inside(const struct in6_addr* address) {
-    struct ifaddrs* interfaces = NULL;
-    const struct in6_addr plain = translated(address);
-    int found = is_special(&plain);
+/* Asks for the route of the address; the size of the message. */
+static size_t describe_question(const struct in6_addr* address, unsigned char* bytes) {
+    const int is_ipv4 = IN6_IS_ADDR_V4MAPPED(address);
+    const size_t size = is_ipv4 ? sizeof(struct in_addr) : sizeof(*address);
+    struct nlmsghdr* head = (struct nlmsghdr*)(void*)bytes;
+    struct rtmsg* route = NLMSG_DATA(head);
+    struct rtattr* destination = (struct rtattr*)(void*)(bytes + NLMSG_SPACE(sizeof(*route)));
 
-    if (found) {
+    head->nlmsg_len = (uint32_t)(NLMSG_SPACE(sizeof(*route)) + RTA_LENGTH(size));
+    head->nlmsg_type = RTM_GETROUTE;
+    head->nlmsg_flags = NLM_F_REQUEST;
+    route->rtm_family = is_ipv4 ? AF_INET : AF_INET6;
+    route->rtm_dst_len = (unsigned char)(size * 8);
+    destination->rta_type = RTA_DST;
+    destination->rta_len = (unsigned short)RTA_LENGTH(size);
+    memcpy(RTA_DATA(destination), is_ipv4 ? address->s6_addr + 12 : address->s6_addr, size);
+    return head->nlmsg_len;
+}
+
+/* Whether the kernel takes what is sent there for itself, be it for an interface's address or by a route, or
+ * sends it to many (rtnetlink(7)). What cannot be asked counts as inside, and what has no route at all as
+ * outside. */
+static int leads_inside(const struct in6_addr* address) {
+    union {
+        struct nlmsghdr head;
+        unsigned char bytes[4096];
+    } message;
+    int inside = 1;
+
+    memset(&message, 0, sizeof(message));
+    int kernel = socket(AF_NETLINK, SOCK_RAW | SOCK_CLOEXEC, NETLINK_ROUTE);
+    if (kernel < 0) {
         return 1;
     }
-    if (getifaddrs(&interfaces) < 0) {
+    const size_t size = describe_question(address, message.bytes);
+    if (send(kernel, &message, size, 0) == (ssize_t)size &&
+        recv(kernel, &message, sizeof(message), 0) >= (ssize_t)NLMSG_SPACE(sizeof(struct rtmsg))) {
+        if (message.head.nlmsg_type == RTM_NEWROUTE) {
+            inside = ((const struct rtmsg*)NLMSG_DATA(&message.head))->rtm_type != RTN_UNICAST;
+        } else if (message.head.nlmsg_type == NLMSG_ERROR) {
+            const int error = ((const struct nlmsgerr*)NLMSG_DATA(&message.head))->error;
+            inside = error != -ENETUNREACH && error != -EHOSTUNREACH;
+        }
+    }
+    (void)close(kernel);
+    return inside;
+}
+
+static int is_one_inside(const struct in6_addr* address, const struct in6_addr* external) {
+    return is_special(address) || (external != NULL && IN6_ARE_ADDR_EQUAL(address, external)) ||
+           leads_inside(address);
+}
+
+int velt_is_inside(const struct in6_addr* address, const struct in6_addr* external) {
+    struct in6_addr plain;
+
+    if (is_one_inside(address, external)) {
         return 1;
     }
-    for (const struct ifaddrs* one = interfaces; one != NULL && !found; one = one->ifa_next) {
-        found = is_at(address, one->ifa_addr) || is_at(&plain, one->ifa_addr);
+    for (size_t i = 0; i < sizeof(forms) / sizeof(forms[0]); i++) {
+        if (translate(&forms[i], address, &plain) && is_one_inside(&plain, external)) {
+            return 1;
+        }
     }
-    freeifaddrs(interfaces);
-    return found;
+    return 0;
 }

@@ -11,8 +11,10 @@ int velt_read_port(const char* argument, struct in6_addr* address);
 int velt_read_eprt(const char* argument, struct in6_addr* address);
 
 /* Whether this is an address that leads to this server itself or to nobody in particular: loopback,
- * link-local, multicast, unspecified or reserved, or one of the server's interfaces. An IPv4 address in its
- * mapped form. When the interfaces cannot be listed, every address is inside. */
-int velt_is_inside(const struct in6_addr* address);
+ * link-local, multicast, unspecified or reserved, one that the kernel takes for this server's, or `external`,
+ * under which it is known outside (NULL for none); or an IPv6 address that a gateway would translate into
+ * such a one. An IPv4 address in its mapped form. When the kernel cannot be asked, every address is inside.
+ */
+int velt_is_inside(const struct in6_addr* address, const struct in6_addr* external);
 
 #endif

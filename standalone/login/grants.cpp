@@ -18,6 +18,27 @@ std::string keyOf(const std::filesystem::path& place) {
     return key;
 }
 
+std::string sentenceOf(const GrantSource& source, const Identity& user, const ShareEntry& share) {
+    const std::string name = "The share " + share.name;
+    if (!source.access) {
+        return name + " has no entry for " + user.name + " or for a group of this user.";
+    }
+    const std::string whom = source.group.empty() ? user.name : "the group " + source.group;
+    if (*source.access == Access::none) {
+        return name + " refuses " + whom +
+               (source.isKnown ? "." : ", which cannot be looked up: so it refuses everybody.");
+    }
+    return name + " grants " + whom +
+           (*source.access == Access::write ? " reading and writing." : " reading.");
+}
+
+/// What the file system allows where that is less than what is granted.
+std::string sentenceOf(Access allowed, const Identity& user, const ShareEntry& share) {
+    return "The file system " + std::string(allowed == Access::none ? "does not let " : "lets ") + user.name +
+           (allowed == Access::none ? " list and enter " + share.path + "."
+                                    : " read " + share.path + ", but not write to it.");
+}
+
 } // namespace
 
 /// The grant, or what the file system allows where that is less.
@@ -96,6 +117,51 @@ Access Grants::on(const ShareEntry& share) const {
     around(self->place,
            [&access](const Known& known) { access = std::min(access, known.told.value_or(access)); });
     return access;
+}
+
+std::vector<std::pair<std::string, std::filesystem::path>>
+Grants::sharesNear(const std::filesystem::path& place) const {
+    std::vector<std::pair<std::string, std::filesystem::path>> near;
+    const Known* innermost = nullptr;
+    around(place, [&innermost](const Known& known) { innermost = &known; });
+    if (innermost != nullptr) {
+        near.emplace_back(innermost->share->name, innermost->place);
+    }
+    for (const Known& known : strictlyBelow(place)) {
+        near.emplace_back(known.share->name, known.place);
+    }
+    return near;
+}
+
+std::optional<std::filesystem::path> Grants::placeOfShare(const std::string& name) const {
+    const auto found =
+        std::ranges::find_if(known_, [&name](const Known& known) { return known.share->name == name; });
+    return found != known_.end() && found->found ? std::optional(found->place) : std::nullopt;
+}
+
+std::vector<std::string> Grants::reasonsOn(const Identity& user, const ShareEntry& share) const {
+    const auto self = std::ranges::find(known_, &share, &Known::share);
+    const GrantSource source = grantSource(user, share);
+    std::vector<std::string> reasons{sentenceOf(source, user, share)};
+    const Access granted = source.access.value_or(Access::none);
+    if (granted == Access::none) {
+        return reasons;
+    }
+    const auto allowed = accessTo(user, share.path);
+    if (!allowed || *allowed < granted) {
+        reasons.push_back(allowed ? sentenceOf(*allowed, user, share) : allowed.error().message);
+    }
+    const Access least = std::min(granted, allowed.valueOr(Access::none));
+    if (self->told < least) {
+        reasons.emplace_back("A share within it is missing; until it is back, nobody writes here.");
+    }
+    around(self->place, [&](const Known& known) {
+        if (known.share != &share && known.told && *known.told < least) {
+            reasons.push_back("The share " + known.share->name + " around it lets the user " +
+                              (*known.told == Access::none ? "do nothing." : "only read."));
+        }
+    });
+    return reasons;
 }
 
 Access Grants::leastAt(const std::filesystem::path& place, const std::filesystem::path& outer,

@@ -9,6 +9,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace velt {
@@ -43,6 +44,16 @@ public:
     /// write there could put another folder in the place of one, and the right one, wherever it is now, has
     /// no restrictions; so the shares around them grant at most reading.
     const std::vector<std::string>& missing() const { return missing_; }
+
+    /// Names and places of the shares below this place, and of the innermost one at it or around it.
+    std::vector<std::pair<std::string, std::filesystem::path>>
+    sharesNear(const std::filesystem::path& place) const;
+
+    /// Why `on` says what it says, in sentences: the entry of the share first, then what takes from it.
+    std::vector<std::string> reasonsOn(const Identity& user, const ShareEntry& share) const;
+
+    /// The folder of the share of this name, when it was found.
+    std::optional<std::filesystem::path> placeOfShare(const std::string& name) const;
 
     /// A sentence for each share to which the user's access could not be checked.
     const std::vector<std::string>& remarks() const { return remarks_; }

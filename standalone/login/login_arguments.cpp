@@ -10,7 +10,7 @@ namespace velt {
 namespace {
 
 /// In the order of DefaultView.
-constexpr std::array<std::string_view, 4> views{"home", "shares", "anonymous", "server"};
+constexpr std::array<std::string_view, 5> views{"home", "shares", "anonymous", "server", "stored"};
 
 std::optional<unsigned> numberOf(std::string_view text) {
     unsigned number = 0;

@@ -1,4 +1,4 @@
-// The words with which the FTP daemon starts the login program.
+// The words with which a daemon starts the login program.
 #ifndef VELT_STANDALONE_LOGIN_LOGIN_ARGUMENTS_H
 #define VELT_STANDALONE_LOGIN_LOGIN_ARGUMENTS_H
 

@@ -1,5 +1,8 @@
 #include "standalone/login/login_program.h"
 
+#include "standalone/activity/shown_places.h"
+#include "standalone/login/told_places.h"
+
 #include <errno.h>
 #include <fcntl.h>
 #include <poll.h>
@@ -7,19 +10,28 @@
 #include <spawn.h>
 #include <stdio.h>
 #include <string.h>
+#include <sys/mman.h>
 #include <sys/wait.h>
 #include <time.h>
 #include <unistd.h>
 
-/* Nothing but the error output: the program must not get the client's connection or the server's keys. */
-static int describe_files(posix_spawn_file_actions_t* files, int errors) {
-    int failure = posix_spawn_file_actions_adddup2(files, errors, STDERR_FILENO);
+/* What the program writes: why it refuses, and what the view shows. Without a place for that it has no
+ * output, and refuses where the session must know of it. */
+struct outputs {
+    int errors;
+    int facts;
+};
+
+/* Nothing but the outputs: the program must not get the client's connection or the server's keys. */
+static int describe_files(posix_spawn_file_actions_t* files, const struct outputs* outputs) {
+    int failure = posix_spawn_file_actions_adddup2(files, outputs->errors, STDERR_FILENO);
 
     if (failure == 0) {
         failure = posix_spawn_file_actions_addopen(files, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
     }
     if (failure == 0) {
-        failure = posix_spawn_file_actions_addopen(files, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
+        failure = outputs->facts >= 0 ? posix_spawn_file_actions_adddup2(files, outputs->facts, STDOUT_FILENO)
+                                      : posix_spawn_file_actions_addclose(files, STDOUT_FILENO);
     }
     return failure != 0 ? failure : posix_spawn_file_actions_addclosefrom_np(files, STDERR_FILENO + 1);
 }
@@ -35,7 +47,7 @@ static int describe_signals(posix_spawnattr_t* attributes) {
     return posix_spawnattr_setflags(attributes, POSIX_SPAWN_SETSIGMASK | POSIX_SPAWN_SETSIGDEF);
 }
 
-static int spawn(char* const arguments[], int errors, pid_t* child) {
+static int spawn(char* const arguments[], const struct outputs* outputs, pid_t* child) {
     static char* const no_environment[] = {NULL};
     posix_spawn_file_actions_t files;
     posix_spawnattr_t attributes;
@@ -49,7 +61,7 @@ static int spawn(char* const arguments[], int errors, pid_t* child) {
         (void)posix_spawn_file_actions_destroy(&files);
         return failure;
     }
-    failure = describe_files(&files, errors);
+    failure = describe_files(&files, outputs);
     if (failure == 0) {
         failure = describe_signals(&attributes);
     }
@@ -148,22 +160,35 @@ static int await(pid_t child, int errors, int limit, char* words, size_t size) {
     return 1;
 }
 
-int velt_run_login_program(char* const arguments[], int limit, char* words, size_t size) {
+/* If standard files are closed, it could have taken one of their numbers. */
+static int move_away(int descriptor) {
+    int moved = descriptor >= 0 ? fcntl(descriptor, F_DUPFD_CLOEXEC, STDERR_FILENO + 1) : -1;
+    int reason = errno;
+
+    if (descriptor >= 0) {
+        (void)close(descriptor);
+    }
+    errno = reason;
+    return moved;
+}
+
+static void close_output(int descriptor) {
+    if (descriptor >= 0) {
+        (void)close(descriptor);
+    }
+}
+
+static int run(char* const arguments[], int limit, int facts, char* words, size_t size) {
     int ends[2] = {-1, -1};
     pid_t child = -1;
 
-    words[0] = '\0';
     if (pipe2(ends, O_CLOEXEC) < 0) {
         (void)snprintf(words, size, "%s", strerror(errno));
         return 0;
     }
-    /* If standard files are closed, the pipe could have taken their numbers. */
-    int errors = fcntl(ends[1], F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
-    int failure = errors < 0 ? errno : spawn(arguments, errors, &child);
-    if (errors >= 0) {
-        (void)close(errors);
-    }
-    (void)close(ends[1]);
+    const struct outputs outputs = {move_away(ends[1]), facts};
+    int failure = outputs.errors < 0 ? errno : spawn(arguments, &outputs, &child);
+    close_output(outputs.errors);
     int good = 0;
     if (failure != 0) {
         (void)snprintf(words, size, "%s: %s", arguments[0], strerror(failure));
@@ -171,5 +196,19 @@ int velt_run_login_program(char* const arguments[], int limit, char* words, size
         good = await(child, ends[0], limit, words, size);
     }
     (void)close(ends[0]);
+    return good;
+}
+
+int velt_run_login_program(char* const arguments[], int limit, char* words, size_t size) {
+    int facts = move_away(memfd_create("view", MFD_CLOEXEC));
+
+    words[0] = '\0';
+    int good = run(arguments, limit, facts, words, size);
+    velt_note_shown_places(good ? facts : -1);
+    if (good && velt_keep_told_places(facts) < 0) {
+        (void)snprintf(words, size, "cannot read which folders rules lead to: %s", strerror(errno));
+        good = 0;
+    }
+    close_output(facts);
     return good;
 }

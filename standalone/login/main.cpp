@@ -1,11 +1,12 @@
 // velt-login-view STATE VIEW ROOT USER UID GIDS HOME [FILE]
 //
-// Makes the folder ROOT show what a login of the FTP daemon may see, in the mount namespace of the session
+// Makes the folder ROOT show what a login may see, in the mount namespace of the session
 // that started this program. Ends with 0 when the session may use ROOT as its root directory, else with the
-// reason on standard error. Nobody else sees the view, and it ends with the session.
+// reason on standard error; standard output gets what the session may say of its files. Nobody else sees the
+// view, and it ends with the session.
 //
-// STATE is the state root; VIEW is "home", "shares", "anonymous" or "server", as in login_view.h; GIDS are
-// the numbers of the user's groups, the primary one first, separated by commas; FILE holds the name
+// STATE is the state root; VIEW is "home", "shares", "anonymous", "server" or "stored", as in login_view.h;
+// GIDS are the numbers of the user's groups, the primary one first, separated by commas; FILE holds the name
 // of the share for anonymous users.
 #include "base/plain_text.h"
 #include "standalone/core/state_root.h"

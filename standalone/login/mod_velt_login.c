@@ -11,23 +11,20 @@
 #include "conf.h"
 #include "privs.h"
 
-#include "standalone/login/access_files.h"
 #include "standalone/login/admission.h"
+#include "standalone/login/banned_address.h"
+#include "standalone/login/client_address.h"
+#include "standalone/login/command_records.h"
 #include "standalone/login/file_functions.h"
-#include "standalone/login/login_program.h"
 #include "standalone/login/main_process.h"
 #include "standalone/login/own_files.h"
 #include "standalone/login/refused_commands.h"
 #include "standalone/login/session_mounts.h"
-
-#include <sched.h>
+#include "standalone/login/session_view.h"
 
 #define MODULE_VERSION "mod_velt_login/2.0"
 
 module velt_login_module;
-
-/* In seconds: far more than a login takes, and less than clients wait. */
-static const int longest_run = 20;
 
 /* The user this session's view was made for. The login may still fail, and another user try next. */
 static const char* made_for = NULL;
@@ -64,14 +61,6 @@ static struct passwd* copy_account(pool* p, const char* user) {
     return copy;
 }
 
-/* Without root's rights all sessions work as the daemon's own user, so that user's home counts, too. */
-static int keep_homes(const char* home) {
-    const struct passwd* self = geteuid() != 0 ? getpwuid(geteuid()) : NULL;
-
-    velt_forget_homes();
-    return velt_keep_home(home) == 0 && (self == NULL || velt_keep_home(self->pw_dir) == 0);
-}
-
 static int run_program(pool* p, const config_rec* c, const char* kind, const char* root, const char* user) {
     char words[1024] = "cannot look up the account or its groups";
     int good = FALSE;
@@ -79,30 +68,19 @@ static int run_program(pool* p, const config_rec* c, const char* kind, const cha
     struct passwd* pw = copy_account(p, user);
     char* groups = pw != NULL ? groups_text(p, pw) : NULL;
     if (groups != NULL) {
-        char* arguments[] = {c->argv[0],
-                             c->argv[1],
-                             pstrdup(p, kind),
-                             pstrdup(p, root),
-                             pw->pw_name,
-                             pstrdup(p, pr_uid2str(p, pw->pw_uid)),
-                             groups,
-                             pw->pw_dir,
-                             c->argc > 3 && session.anon_config != NULL ? c->argv[3] : NULL,
-                             NULL};
-        /* Where everything may be seen, no view is made. */
-        int isolated = strcmp(kind, "server") != 0;
+        char* arguments[velt_view_words] = {
+            [velt_view_program] = c->argv[0],
+            [velt_view_state] = c->argv[1],
+            [velt_view_kind] = pstrdup(p, kind),
+            [velt_view_root] = pstrdup(p, root),
+            [velt_view_user] = pw->pw_name,
+            [velt_view_uid] = pstrdup(p, pr_uid2str(p, pw->pw_uid)),
+            [velt_view_gids] = groups,
+            [velt_view_home] = pw->pw_dir,
+            [velt_view_file] = c->argc > 3 && session.anon_config != NULL ? c->argv[3] : NULL,
+        };
         PRIVS_ROOT
-        if (isolated && strcmp(root, "/") == 0) {
-            (void)snprintf(words, sizeof(words), "DefaultRoot is missing from the configuration");
-        } else if (isolated && unshare(CLONE_NEWNS) < 0) {
-            (void)snprintf(words, sizeof(words), "cannot make a mount namespace: %s", strerror(errno));
-        } else if (!keep_homes(pw->pw_dir)) {
-            (void)snprintf(words, sizeof(words), "cannot look at the home: %s", strerror(errno));
-        } else if (velt_note_access_files(c->argv[1]) < 0) {
-            (void)snprintf(words, sizeof(words), "cannot look at the shares and rules: %s", strerror(errno));
-        } else {
-            good = velt_run_login_program(arguments, longest_run, words, sizeof(words));
-        }
+        good = velt_make_session_view(arguments, words, sizeof(words));
         PRIVS_RELINQUISH
     }
     if (!good) {
@@ -133,6 +111,21 @@ static int make_view(const char* root, int anonymous) {
     return good;
 }
 
+/* The firewall ends no connection that was open before its address was banned. */
+static int is_banned(void) {
+    const config_rec* c = find_config(main_server->conf, CONF_PARAM, "VeltLoginView", FALSE);
+    struct in6_addr address;
+    int banned = FALSE;
+
+    if (c == NULL || !velt_read_address(session.c->remote_addr, &address)) {
+        return FALSE;
+    }
+    PRIVS_ROOT
+    banned = velt_is_banned(c->argv[1], &address, time(NULL));
+    PRIVS_RELINQUISH
+    return banned;
+}
+
 /* A local user's password has been checked, or the user is not known. */
 static void on_authenticated(const void* data, void* ignored) {
     /* The daemon reads the code again after all listeners. */
@@ -142,7 +135,14 @@ static void on_authenticated(const void* data, void* ignored) {
     if (code == NULL || session.anon_config != NULL) {
         return;
     }
+    velt_expect_login();
+    if (is_banned()) {
+        velt_note_refused_login("banned");
+        *code = PR_AUTH_DISABLEDPWD;
+        return;
+    }
     if (*code < 0) {
+        velt_note_refused_login("password");
         /* The supervisor counts these lines. Nothing in them is of the client's choosing. */
         pr_log_pri(PR_LOG_NOTICE, "mod_velt_login: password refused from %s",
                    pr_netaddr_get_ipstr(session.c->remote_addr));
@@ -150,9 +150,11 @@ static void on_authenticated(const void* data, void* ignored) {
     }
     const config_rec* c = find_config(main_server->conf, CONF_PARAM, "DefaultRoot", FALSE);
     if (!make_view(c != NULL ? c->argv[0] : "/", FALSE)) {
+        velt_note_refused_login("configuration");
         *code = PR_AUTH_DISABLEDPWD;
         return;
     }
+    velt_expect_success();
     velt_note_login();
 }
 
@@ -162,14 +164,17 @@ static void on_chroot(const void* root, void* ignored) {
     (void)ignored;
 
     if (session.anon_config != NULL) {
+        velt_expect_login();
         good = make_view(root, TRUE);
     } else {
         good = made_for != NULL && session.user != NULL && strcmp(made_for, session.user) == 0;
     }
     if (!good) {
+        velt_note_refused_login("configuration");
         pr_response_send(R_530, "Login incorrect.");
         pr_session_end(0);
     }
+    velt_expect_success();
     velt_note_login();
     velt_keep_root();
 }
@@ -239,7 +244,8 @@ static int velt_sess_init(void) {
     /* The daemon's port may be shared with its successor; the ports of data connections are a session's own.
      */
     main_server->tcp_reuse_port = -1;
-    if (pr_event_register(&velt_login_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
+    if (velt_watch_session(&velt_login_module) < 0 ||
+        pr_event_register(&velt_login_module, "mod_auth.authentication-code", on_authenticated, NULL) < 0 ||
         pr_event_register(&velt_login_module, "core.chroot", on_chroot, NULL) < 0) {
         return -1;
     }
@@ -249,10 +255,24 @@ static int velt_sess_init(void) {
 static conftable velt_conftab[] = {
     {"VeltLoginView", set_velt_login_view, NULL},
     {"VeltSpared", velt_set_spared, NULL},
+    {"VeltConfiguration", velt_set_configuration, NULL},
     {NULL, NULL, NULL},
 };
 
+static cmdtable velt_commands[] = {
+    {PRE_CMD, C_ANY, G_NONE, velt_look_at_characters, FALSE, FALSE, 0, NULL},
+    {PRE_CMD, C_ANY, G_NONE, velt_note_command, FALSE, FALSE, 0, NULL},
+    {PRE_CMD, C_PORT, G_NONE, velt_refuse_data_to_the_inside, TRUE, FALSE, 0, NULL},
+    {PRE_CMD, C_EPRT, G_NONE, velt_refuse_data_to_the_inside, TRUE, FALSE, 0, NULL},
+    {PRE_CMD, C_STOU, G_NONE, velt_refuse_unique_name, TRUE, FALSE, 0, NULL},
+    {CMD, C_ANY, G_NONE, velt_refuse_name, FALSE, FALSE, 0, NULL},
+    {CMD, C_ANY, G_NONE, velt_note_start, FALSE, FALSE, 0, NULL},
+    {LOG_CMD, C_ANY, G_NONE, velt_note_success, FALSE, FALSE, 0, NULL},
+    {LOG_CMD_ERR, C_ANY, G_NONE, velt_note_failure, FALSE, FALSE, 0, NULL},
+    {0, NULL, NULL, NULL, FALSE, FALSE, 0, NULL},
+};
+
 module velt_login_module = {
-    NULL, NULL,      0x20,           "velt_login",   velt_conftab, velt_refused_commands,
+    NULL, NULL,      0x20,           "velt_login",   velt_conftab, velt_commands,
     NULL, velt_init, velt_sess_init, MODULE_VERSION, NULL,         0,
 };

@@ -2,11 +2,10 @@
 
 #include "base/file.h"
 #include "standalone/core/error_number.h"
+#include "standalone/login/file_rights.h"
 
 #include <fcntl.h>
-#include <grp.h>
 #include <linux/openat2.h>
-#include <sys/fsuid.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <unistd.h>
@@ -21,31 +20,6 @@ namespace velt {
 namespace {
 
 constexpr int asFolder = O_PATH | O_DIRECTORY | O_CLOEXEC;
-
-// While it lives, files are opened with the user's rights: with the user's number for file access the kernel
-// also drops root's capabilities over files.
-class FileRightsOf {
-public:
-    explicit FileRightsOf(const Identity& user) : taken_(setgroups(user.gids.size(), user.gids.data()) == 0) {
-        setfsgid(user.gids.front());
-        setfsuid(user.uid);
-        // Neither call reports a failure, but each returns the number before it.
-        taken_ = taken_ && static_cast<uid_t>(setfsuid(user.uid)) == user.uid &&
-                 static_cast<gid_t>(setfsgid(user.gids.front())) == user.gids.front();
-    }
-    ~FileRightsOf() {
-        setfsuid(geteuid());
-        setfsgid(getegid());
-        setgroups(0, nullptr);
-    }
-    FileRightsOf(const FileRightsOf&) = delete;
-    FileRightsOf& operator=(const FileRightsOf&) = delete;
-
-    bool taken() const { return taken_; }
-
-private:
-    bool taken_;
-};
 
 Result<UniqueFd> openBelow(const UniqueFd& folder, const std::filesystem::path& path,
                            unsigned long long resolve) {

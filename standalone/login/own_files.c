@@ -1,12 +1,14 @@
 #include "standalone/login/own_files.h"
 
+#include "standalone/login/kept_objects.h"
+#include "standalone/login/own_names.h"
 #include "standalone/login/way.h"
 
+#include <dirent.h>
 #include <errno.h>
 #include <fcntl.h>
 #include <limits.h>
 #include <stdio.h>
-#include <stdlib.h>
 #include <string.h>
 #include <strings.h>
 #include <sys/stat.h>
@@ -14,116 +16,12 @@
 
 enum {
     most_homes = 2,
+    deepest = 4,          /* folders below one of the home's own, where links are looked for */
+    most_entries = 20000, /* that are looked at for that */
     folder_flags = O_PATH | O_DIRECTORY | O_CLOEXEC
 };
 
-/* A star stands for the rest of a name. What lies in a folder, or stands behind a link, is found by the name
- * without its star only. */
-static const char* const own_names[] = {
-    /* who may log in */
-    ".ssh",
-    ".lsh",
-    ".rhosts",
-    ".shosts",
-    ".klogin",
-    ".k5login",
-    ".k5users",
-    ".eid",
-    ".monkeysphere",
-    ".google_authenticator",
-    ".yubico",
-    ".otpw",
-    ".pamusb",
-    /* what logins and their services start or mount */
-    ".pam_environment",
-    ".pam_mount.conf.xml",
-    ".ecryptfs",
-    ".config",
-    ".local",
-    ".byobu",
-    ".gnupg",
-    ".keychain",
-    ".pulse",
-    ".asoundrc",
-    /* what mail starts */
-    ".forward*",
-    ".procmail",
-    ".procmailrc",
-    ".mailfilter*",
-    ".mailfilters",
-    ".maildelivery",
-    ".mailrc",
-    ".msmtprc",
-    ".qmail*",
-    ".courier*",
-    ".dovecot*",
-    ".dovecot.sieve",
-    /* what shells read; zsh prefers a compiled file beside one that it sources */
-    ".profile",
-    ".profile.zwc",
-    ".shrc",
-    ".bashrc*",
-    ".bash_profile*",
-    ".bash_login*",
-    ".bash_logout*",
-    ".bash_aliases*",
-    ".bash_completion*",
-    ".login",
-    ".logout",
-    ".cshrc",
-    ".cshdirs",
-    ".tcshrc",
-    ".kshrc*",
-    ".mkshrc*",
-    ".zshrc*",
-    ".zshenv*",
-    ".zprofile*",
-    ".zlogin*",
-    ".zlogout*",
-    ".zcompdump*",
-    ".yashrc",
-    ".yash_profile",
-    ".rcrc",
-    ".esrc",
-    ".aliasrc",
-    ".xonshrc",
-    ".inputrc",
-    ".lessfilter",
-    /* where shells look for programs first */
-    "bin",
-    /* what gives or extends a login that serves repositories alone */
-    "git-shell-commands",
-    ".gitconfig",
-    ".gitolite*",
-    ".hgrc",
-    ".bazaar",
-    /* what desktops start */
-    ".vnc",
-    ".xpra",
-    "startwm.sh",
-    ".xprofile",
-    ".xsession",
-    ".xsessionrc",
-    ".xinitrc",
-    ".xserverrc",
-    ".xinputrc",
-    ".xbindkeysrc*",
-    ".gnomerc",
-    NULL,
-};
-
 static const char* const root_names[] = {"etc", "lib", NULL};
-
-struct identity {
-    dev_t device;
-    ino_t number;
-};
-
-/* What stands at a kept place, or on the way to one. */
-struct kept {
-    struct identity object;
-    int whole; /* else its name alone is kept, since other places depend on it */
-};
 
 struct home {
     char path[PATH_MAX];
@@ -133,50 +31,7 @@ struct home {
 
 static struct home homes[most_homes];
 static size_t home_count;
-static struct kept* kept;
-static size_t kept_count;
 static int root_is_kept;
-
-static struct identity identity_of(const struct stat* status) {
-    struct identity found = {status->st_dev, status->st_ino};
-    return found;
-}
-
-static int is(struct identity one, const struct stat* other) {
-    return one.device == other->st_dev && one.number == other->st_ino;
-}
-
-static int keep(const struct stat* object, int whole) {
-    struct kept* larger = realloc(kept, (kept_count + 1) * sizeof(*kept));
-    if (larger == NULL) {
-        return -1;
-    }
-    kept = larger;
-    kept[kept_count].object = identity_of(object);
-    kept[kept_count].whole = whole;
-    kept_count++;
-    return 0;
-}
-
-static int keep_name(const struct stat* object, int is_end) {
-    (void)is_end;
-    return keep(object, 0);
-}
-
-static void forget_kept(void) {
-    free(kept);
-    kept = NULL;
-    kept_count = 0;
-}
-
-static int is_kept(const struct stat* object, int whole_only) {
-    for (size_t i = 0; i < kept_count; i++) {
-        if (is(kept[i].object, object) && (kept[i].whole || !whole_only)) {
-            return 1;
-        }
-    }
-    return 0;
-}
 
 /* Closes a folder that is only looked at, and leaves errno alone. */
 static void leave(int folder) {
@@ -196,20 +51,132 @@ static const char* stem_of(const char* name, char* stem, size_t size) {
     return stem;
 }
 
-static int keep_files(struct home* home) {
-    char stem[NAME_MAX + 1];
+/* Keeps what stands at this place below the home, be it behind links. 1 when it is a folder that may hold
+ * more of that, 0 when not, or -1 with errno. What cannot be reached is recognised by its name alone. Any
+ * other failure may be over in a moment, and what it hid could be changed then. */
+static int keep_at(const struct home* home, const char* below) {
     struct velt_way_end end;
 
-    if (velt_walk_way(home->path, "", keep_name, &home->end) < 0) {
+    if (velt_walk_way(home->path, below, NULL, &end) < 0) {
+        return is_out_of_reach(errno) ? 0 : -1;
+    }
+    if (end.exists && velt_is_around_home(&end.what)) {
+        return 0; /* a link to all of the home stands for none of its own files */
+    }
+    if (velt_walk_way(home->path, below, velt_keep_object, &end) < 0) {
+        return is_out_of_reach(errno) ? 0 : -1;
+    }
+    return end.exists ? S_ISDIR(end.what.st_mode) : velt_keep_absent(&end);
+}
+
+/* Whether the link stays within its folder, as far as its text tells. */
+static int leads_below(int folder, const char* name) {
+    char target[PATH_MAX];
+
+    ssize_t length = readlinkat(folder, name, target, sizeof(target) - 1);
+    if (length <= 0) {
+        return 0;
+    }
+    target[length] = '\0';
+    return target[0] != '/' && strncmp(target, "../", 3) != 0 && strcmp(target, "..") != 0;
+}
+
+static int is_link(int folder, const struct dirent* entry) {
+    struct stat status;
+
+    if (entry->d_type != DT_UNKNOWN) {
+        return entry->d_type == DT_LNK;
+    }
+    return fstatat(folder, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISLNK(status.st_mode);
+}
+
+/* Of a folder that is listed, what is done with an entry: 0, or -1 with errno. */
+struct listing {
+    const struct home* home;
+    const char* below; /* the home */
+    int depth;         /* of the folder; 0 is the home itself */
+    int* left;         /* entries that may still be looked at */
+};
+
+static int keep_listed(const struct listing* listing);
+
+/* What programs obey may be kept anywhere, such as on another disk. The rest of the dot names is kept for
+ * caution, which is not to close folders that have other uses. */
+static int is_followed(const struct listing* listing, int folder, const struct dirent* entry) {
+    const int links = is_link(folder, entry);
+
+    if (listing->depth > 0) {
+        return links;
+    }
+    return velt_is_own_name(entry->d_name) &&
+           (velt_is_listed_own_name(entry->d_name) || !links || leads_below(folder, entry->d_name));
+}
+
+static int keep_entry(const struct listing* listing, int folder, const struct dirent* entry) {
+    char below[PATH_MAX];
+    const char* between = listing->below[0] == '\0' ? "" : "/";
+    int holds_more = listing->depth > 0 && entry->d_type == DT_DIR;
+
+    if (snprintf(below, sizeof(below), "%s%s%s", listing->below, between, entry->d_name) >=
+        (int)sizeof(below)) {
+        return 0;
+    }
+    if (is_followed(listing, folder, entry)) {
+        holds_more = keep_at(listing->home, below);
+    }
+    if (holds_more <= 0 || listing->depth == deepest ||
+        (listing->depth == 0 && !velt_is_listed_own_name(entry->d_name))) {
+        return holds_more < 0 ? -1 : 0;
+    }
+    struct listing deeper = {listing->home, below, listing->depth + 1, listing->left};
+    return keep_listed(&deeper);
+}
+
+/* The links in the home, and in what is known to be obeyed there. */
+static int keep_listed(const struct listing* listing) {
+    const struct dirent* entry = NULL;
+    int result = 0;
+
+    int folder = velt_open_way(listing->home->path, listing->below);
+    DIR* list = folder < 0 ? NULL : fdopendir(folder);
+    if (list == NULL) {
+        if (folder >= 0) {
+            leave(folder);
+        }
+        return errno == ENOENT || errno == ENOTDIR || is_out_of_reach(errno) ? 0 : -1;
+    }
+    for (errno = 0; result == 0 && *listing->left > 0 && (entry = readdir(list)) != NULL; errno = 0) {
+        (*listing->left)--;
+        if (strcmp(entry->d_name, ".") != 0 && strcmp(entry->d_name, "..") != 0) {
+            result = keep_entry(listing, folder, entry);
+        }
+    }
+    if (result == 0 && entry == NULL && errno != 0 && !is_out_of_reach(errno)) {
+        result = -1;
+    }
+    int reason = errno;
+    (void)closedir(list);
+    errno = reason;
+    return result;
+}
+
+static int keep_files(struct home* home) {
+    char stem[NAME_MAX + 1];
+    int left = most_entries;
+    struct listing all = {home, "", 0, &left};
+    struct velt_way_end root; /* which is visited on no way */
+
+    if (velt_walk_way("/", "", NULL, &root) < 0 || velt_keep_way_to_home(&root.what, 0) < 0 ||
+        velt_walk_way(home->path, "", velt_keep_way_to_home, &home->end) < 0) {
         return -1;
     }
-    for (const char* const* name = own_names; home->end.exists && *name != NULL; name++) {
-        /* What cannot be reached is recognised by its name alone. Any other failure
-         * may be over in a moment, and what it hid could be changed then. */
-        if (velt_walk_way(home->path, stem_of(*name, stem, sizeof(stem)), keep, &end) < 0 &&
-            !is_out_of_reach(errno)) {
+    for (const char* const* name = velt_own_names; home->end.exists && *name != NULL; name++) {
+        if (keep_at(home, stem_of(*name, stem, sizeof(stem))) < 0) {
             return -1;
         }
+    }
+    if (home->end.exists && keep_listed(&all) < 0) {
+        return -1;
     }
     home->is_known = 1;
     return 0;
@@ -232,15 +199,25 @@ int velt_keep_home(const char* path) {
 }
 
 void velt_forget_homes(void) {
-    forget_kept();
+    velt_forget_kept();
+    velt_forget_told();
     home_count = 0;
+}
+
+/* Folders that have been made in it since are among its own, too. Where the file system does not count them,
+ * any change may be such a one. */
+static int has_same_folders(const struct stat* one, const struct stat* other) {
+    return one->st_nlink == other->st_nlink &&
+           (one->st_nlink > 1 ||
+            (one->st_mtim.tv_sec == other->st_mtim.tv_sec && one->st_mtim.tv_nsec == other->st_mtim.tv_nsec));
 }
 
 static int is_same_end(const struct velt_way_end* one, const struct velt_way_end* other) {
     if (one->exists || other->exists) {
-        return one->exists && other->exists && is(identity_of(&one->what), &other->what);
+        return one->exists && other->exists && velt_is_same_object(&one->what, &other->what) &&
+               has_same_folders(&one->what, &other->what);
     }
-    return is(identity_of(&one->folder), &other->folder) && strcmp(one->name, other->name) == 0;
+    return velt_is_same_object(&one->folder, &other->folder) && strcmp(one->name, other->name) == 0;
 }
 
 int velt_look_at_homes(void) {
@@ -260,7 +237,7 @@ int velt_look_at_homes(void) {
     if (!changed) {
         return 0;
     }
-    forget_kept();
+    velt_forget_kept();
     for (size_t i = 0; i < home_count; i++) {
         homes[i].is_known = 0;
     }
@@ -276,11 +253,9 @@ void velt_keep_root(void) {
     root_is_kept = 1;
 }
 
-/* In any case: some file systems know no difference. */
-static int is_named(const char* const* names, const char* name) {
-    for (; *names != NULL; names++) {
-        size_t length = strcspn(*names, "*");
-        if (strncasecmp(*names, name, length) == 0 && ((*names)[length] == '*' || name[length] == '\0')) {
+static int is_root_name(const char* name) {
+    for (const char* const* each = root_names; *each != NULL; each++) {
+        if (strcasecmp(*each, name) == 0) {
             return 1;
         }
     }
@@ -294,7 +269,7 @@ static int stands_at(const char* const* names, int folder, const struct stat* ch
 
     for (; *names != NULL; names++) {
         if (fstatat(folder, stem_of(*names, stem, sizeof(stem)), &status, 0) == 0) {
-            if (is(identity_of(child), &status)) {
+            if (velt_is_same_object(child, &status)) {
                 return 1;
             }
         } else if (errno != ENOENT && errno != ENOTDIR && !is_out_of_reach(errno)) {
@@ -304,33 +279,33 @@ static int stands_at(const char* const* names, int folder, const struct stat* ch
     return 0;
 }
 
+static int keeps_in_home(int folder, const char* name, const struct stat* child) {
+    return name != NULL ? velt_is_own_name(name) : stands_at(velt_own_names, folder, child);
+}
+
+static int keeps_in_root(int folder, const char* name, const struct stat* child) {
+    return name != NULL ? is_root_name(name) : stands_at(root_names, folder, child);
+}
+
 /* One folder on the way up from a place: `name` is the place's name when this is its own folder, else NULL,
  * and `child` is the folder from which the way came. 1, 0 or -1 as below. */
 static int keeps(int folder, const struct stat* here, int at_root, const char* name,
                  const struct stat* child) {
-    const char* const* tables[most_homes + 1];
-    size_t count = 0;
+    int result = name != NULL && velt_is_kept_absent(here, name);
 
-    for (size_t i = 0; i < home_count; i++) {
+    for (size_t i = 0; i < home_count && result == 0; i++) {
         const struct velt_way_end* end = &homes[i].end;
-        if (!end->exists && name != NULL && is(identity_of(&end->folder), here) &&
-            strcasecmp(end->name, name) == 0) {
-            return 1;
-        }
-        if (end->exists && is(identity_of(&end->what), here)) {
-            tables[count++] = own_names;
-        }
-    }
-    if (root_is_kept && at_root) {
-        tables[count++] = root_names;
-    }
-    for (size_t i = 0; i < count; i++) {
-        int stands = name != NULL ? is_named(tables[i], name) : stands_at(tables[i], folder, child);
-        if (stands != 0) {
-            return stands;
+        if (!end->exists) {
+            result =
+                name != NULL && velt_is_same_object(&end->folder, here) && strcasecmp(end->name, name) == 0;
+        } else if (velt_is_same_object(&end->what, here)) {
+            result = keeps_in_home(folder, name, child);
         }
     }
-    return is_kept(here, 1);
+    if (result == 0 && root_is_kept && at_root) {
+        result = keeps_in_root(folder, name, child);
+    }
+    return result != 0 ? result : velt_is_kept(here, 1);
 }
 
 /* 1 when the place may not be changed, 0 when it may, -1 with errno. Closes the folder. */
@@ -346,7 +321,7 @@ static int is_within_kept(int folder, const char* name) {
         if (up < 0 || fstat(up, &above) < 0) {
             result = -1;
         }
-        int at_root = result == 0 && is(identity_of(&here), &above);
+        int at_root = result == 0 && velt_is_same_object(&here, &above);
         if (result == 0) {
             result = keeps(folder, &here, at_root, name, &child);
         }
@@ -375,7 +350,7 @@ int velt_may_change(int folder, const char* name, enum velt_change change) {
     if (!exists && errno != ENOENT && !is_out_of_reach(errno)) {
         return -1;
     }
-    int refused = exists && is_kept(&status, change == velt_changes_content);
+    int refused = exists && velt_is_kept(&status, change == velt_changes_content);
     if (!refused) {
         int copy = fcntl(folder, F_DUPFD_CLOEXEC, 0);
         refused = copy < 0 ? -1 : is_within_kept(copy, name);

@@ -66,9 +66,10 @@ int velt_open_place(struct velt_place* place, const char* path, enum velt_change
         if (split(place) < 0) {
             return -1;
         }
-        more = change == velt_changes_content ? take_target(place) : 0;
-        if (more == 0) {
-            more = velt_may_change(place->folder, place->name, change);
+        /* A link's own place counts, too: who obeys what stands there finds the target by it. */
+        more = velt_may_change(place->folder, place->name, change);
+        if (more == 0 && change == velt_changes_content) {
+            more = take_target(place);
         }
         if (more != 0) {
             velt_close_place(place);

@@ -21,7 +21,7 @@ static modret_t* refusal(cmd_rec* cmd) {
     return PR_ERROR_MSG(cmd, R_501, "Control characters are not allowed here");
 }
 
-MODRET look_at_characters(cmd_rec* cmd) {
+modret_t* velt_look_at_characters(cmd_rec* cmd) {
     const unsigned char* authenticated = get_param_ptr(main_server->conf, "authenticated", FALSE);
 
     name_is_refused = FALSE;
@@ -43,7 +43,7 @@ MODRET look_at_characters(cmd_rec* cmd) {
     return PR_DECLINED(cmd);
 }
 
-MODRET refuse_name(cmd_rec* cmd) {
+modret_t* velt_refuse_name(cmd_rec* cmd) {
     return name_is_refused ? refusal(cmd) : PR_DECLINED(cmd);
 }
 
@@ -53,13 +53,16 @@ static int is_same(const struct in6_addr* address, const pr_netaddr_t* other) {
     return velt_read_address(other, &known) && IN6_ARE_ADDR_EQUAL(address, &known);
 }
 
-/* Under which this server is known outside, if that is another than its own. */
-static int is_external(const struct in6_addr* address) {
+static int is_inside(const struct in6_addr* address) {
+    /* Under which this server is known outside, if that is another than its own. */
     const config_rec* c = find_config(main_server->conf, CONF_PARAM, "MasqueradeAddress", FALSE);
-    return c != NULL && c->argv[0] != NULL && is_same(address, c->argv[0]);
+    struct in6_addr external;
+    const int has_external = c != NULL && velt_read_address(c->argv[0], &external);
+
+    return velt_is_inside(address, has_external ? &external : NULL);
 }
 
-MODRET refuse_data_to_the_inside(cmd_rec* cmd) {
+modret_t* velt_refuse_data_to_the_inside(cmd_rec* cmd) {
     const config_rec* c = find_config(main_server->conf, CONF_PARAM, "AllowForeignAddress", FALSE);
     struct in6_addr address;
 
@@ -71,7 +74,7 @@ MODRET refuse_data_to_the_inside(cmd_rec* cmd) {
     if (!(is_port ? velt_read_port : velt_read_eprt)(cmd->argv[1], &address)) {
         return PR_ERROR_MSG(cmd, R_501, "The address cannot be read");
     }
-    if (is_same(&address, session.c->remote_addr) || !(is_external(&address) || velt_is_inside(&address))) {
+    if (is_same(&address, session.c->remote_addr) || !is_inside(&address)) {
         return PR_DECLINED(cmd);
     }
     pr_log_pri(PR_LOG_WARNING, "refused %s %s: an address of this server or of no host",
@@ -79,7 +82,7 @@ MODRET refuse_data_to_the_inside(cmd_rec* cmd) {
     return PR_ERROR_MSG(cmd, R_501, "No data may be sent to this address");
 }
 
-MODRET refuse_unique_name(cmd_rec* cmd) {
+modret_t* velt_refuse_unique_name(cmd_rec* cmd) {
     struct velt_place place;
 
     /* Any name stands for the one that the daemon will make up. */
@@ -89,12 +92,3 @@ MODRET refuse_unique_name(cmd_rec* cmd) {
     velt_close_place(&place);
     return PR_DECLINED(cmd);
 }
-
-cmdtable velt_refused_commands[] = {
-    {PRE_CMD, C_ANY, G_NONE, look_at_characters, FALSE, FALSE, 0, NULL},
-    {CMD, C_ANY, G_NONE, refuse_name, FALSE, FALSE, 0, NULL},
-    {PRE_CMD, C_PORT, G_NONE, refuse_data_to_the_inside, TRUE, FALSE, 0, NULL},
-    {PRE_CMD, C_EPRT, G_NONE, refuse_data_to_the_inside, TRUE, FALSE, 0, NULL},
-    {PRE_CMD, C_STOU, G_NONE, refuse_unique_name, TRUE, FALSE, 0, NULL},
-    {0, NULL, NULL, NULL, FALSE, FALSE, 0, NULL},
-};

@@ -2,8 +2,10 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <linux/openat2.h>
 #include <stdio.h>
 #include <string.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 enum {
@@ -33,6 +35,10 @@ int velt_begin_ways(void) {
     }
     first_folder = open("/", folder_flags);
     return first_folder < 0 ? -1 : 0;
+}
+
+int velt_way_descriptor(void) {
+    return first_folder;
 }
 
 static int enter(struct way* way, int from, const char* name) {
@@ -127,4 +133,25 @@ int velt_walk_way(const char* path, const char* below, velt_visit visit, struct 
     }
     leave(way.folder);
     return more;
+}
+
+int velt_open_way(const char* path, const char* below) {
+    char whole[PATH_MAX];
+    struct open_how how;
+
+    if (snprintf(whole, sizeof(whole), "%s/%s", path, below) >= (int)sizeof(whole)) {
+        errno = ENAMETOOLONG;
+        return -1;
+    }
+    memset(&how, 0, sizeof(how));
+    how.flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NONBLOCK;
+    how.resolve = RESOLVE_IN_ROOT | RESOLVE_NO_MAGICLINKS;
+    /* The kernel gives up (EAGAIN) when folders are moved while it resolves the path. */
+    for (int attempt = 0; attempt < 100; attempt++) {
+        int folder = (int)syscall(SYS_openat2, first_folder, whole, &how, sizeof(how));
+        if (folder >= 0 || errno != EAGAIN) {
+            return folder;
+        }
+    }
+    return -1;
 }

@@ -20,8 +20,14 @@ typedef int (*velt_visit)(const struct stat* object, int is_end);
  */
 int velt_begin_ways(void);
 
+/* Which descriptor that root directory has; -1 without one. */
+int velt_way_descriptor(void);
+
 /* Walks `path` and then `below`, which is "" or a name. `visit` may be NULL. 0 also where nothing stands at
  * the end, or -1 with errno. */
 int velt_walk_way(const char* path, const char* below, velt_visit visit, struct velt_way_end* end);
+
+/* Opens the folder at the end of such a way for listing. A descriptor, or -1 with errno. */
+int velt_open_way(const char* path, const char* below);
 
 #endif

@@ -12,19 +12,18 @@ namespace {
 // The kernel's number for somebody who owns nothing.
 constexpr uid_t stranger = 65534;
 
-std::optional<Access> grantToGroups(const ShareEntry& share, const std::vector<gid_t>& gids) {
-    std::optional<Access> best;
+GrantSource grantToGroups(const ShareEntry& share, const std::vector<gid_t>& gids) {
+    GrantSource best;
     for (const auto& [name, grant] : share.groups) {
         const std::optional<GroupEntry> group = groupByName(name);
         const bool member = group && std::find(gids.begin(), gids.end(), group->gid) != gids.end();
         // Who belongs to a group that cannot be looked up is not known: a refusal of it holds for all.
         if (grant == Access::none && (member || !group)) {
-            return grant;
+            return {grant, name, group.has_value()};
         }
-        if (!member) {
-            continue;
+        if (member && (!best.access || *best.access < grant)) {
+            best = {grant, name};
         }
-        best = std::max(best, std::optional(grant));
     }
     return best;
 }
@@ -41,9 +40,13 @@ Result<std::optional<Access>> limited(std::optional<Access> grant, const ShareEn
 
 } // namespace
 
-std::optional<Access> grantTo(const Identity& user, const ShareEntry& share) {
+GrantSource grantSource(const Identity& user, const ShareEntry& share) {
     const auto entry = share.users.find(user.name);
-    return entry != share.users.end() ? entry->second : grantToGroups(share, user.gids);
+    return entry != share.users.end() ? GrantSource{entry->second, ""} : grantToGroups(share, user.gids);
+}
+
+std::optional<Access> grantTo(const Identity& user, const ShareEntry& share) {
+    return grantSource(user, share).access;
 }
 
 Result<std::optional<Access>> accessOf(const std::string& account, const ShareEntry& share) {
@@ -53,7 +56,7 @@ Result<std::optional<Access>> accessOf(const std::string& account, const ShareEn
     }
     if (const std::optional<GroupEntry> group = groupByName(account)) {
         const Identity member{"", stranger, {group->gid}};
-        return limited(grantToGroups(share, member.gids), share, member);
+        return limited(grantToGroups(share, member.gids).access, share, member);
     }
     return std::optional<Access>();
 }

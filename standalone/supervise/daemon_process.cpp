@@ -1,5 +1,6 @@
 #include "standalone/supervise/daemon_process.h"
 
+#include "base/printable.h"
 #include "base/text.h"
 #include "standalone/ports/port_range.h"
 #include "standalone/process/last_words.h"
@@ -155,8 +156,9 @@ void DaemonProcess::log(const std::string& line) {
 }
 
 void DaemonProcess::takeLine(std::string line) {
-    // The lines reach state files, logs and answers; remove control characters.
+    // The lines reach state files, logs and answers; nothing in them may steer who reads them.
     std::erase_if(line, isControl);
+    line = printable(line);
     if (line.empty()) {
         return;
     }

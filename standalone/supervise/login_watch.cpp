@@ -1,21 +1,34 @@
 #include "standalone/supervise/login_watch.h"
 
+#include "base/text.h"
 #include "base/turn_queue.h"
 #include "standalone/bans/failed_login.h"
 #include "standalone/bans/failure_counter.h"
 #include "standalone/bans/login_guard.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
+#include "standalone/journal/admin_log.h"
+#include "standalone/supervise/refused_logins.h"
 
 #include <syslog.h>
 
 #include <csignal>
 #include <exception>
+#include <memory>
+#include <utility>
 
 namespace velt {
 namespace {
 
-using Reader = std::optional<IpNetwork> (*)(std::string_view message);
+struct Readers {
+    std::optional<IpNetwork> (*failed)(std::string_view message);
+    std::optional<RefusedLogin> (*refused)(std::string_view message);
+    const char* name; ///< of the service, for people
+};
+
+constexpr int logCategory = 2;
+constexpr int logLevel = 1;
+constexpr unsigned refusedEvent = 0x11BF0016;
 
 void count(const std::string& service, const std::string& address) {
     try {
@@ -25,24 +38,47 @@ void count(const std::string& service, const std::string& address) {
     }
 }
 
+/// `item` is the user, a line break, and the reason.
+void log(const char* service, const std::string& item, ReasonsOfLate& reasons) {
+    std::string_view reason = item;
+    const std::string user(cut(reason, '\n'));
+    const std::string sentence(trimmedEnd(reason, ".")); // the log's own ends with one
+    try {
+        if (!reasons.isNew(sentence, ReasonsOfLate::Clock::now())) {
+            return;
+        }
+        const auto logged =
+            logEvent(logCategory, logLevel, refusedEvent, {service, user.c_str(), sentence.c_str(), nullptr});
+        if (!logged) {
+            ::syslog(LOG_ERR, "%s", logged.error().message.c_str());
+        }
+    } catch (const std::exception& error) {
+        ::syslog(LOG_ERR, "cannot log a refused login: %s", error.what());
+    }
+}
+
 /// A queue whose thread leaves all signals to the supervisor's own.
-TurnQueue* startCounting(const std::string& service) {
+TurnQueue* startQueue(TurnQueue::Work work) {
     sigset_t all;
     sigset_t former;
     ::sigfillset(&all);
     ::pthread_sigmask(SIG_SETMASK, &all, &former);
-    auto* const failures =
-        new TurnQueue([service](const std::string& address) { count(service, address); }, {});
+    auto* const queue = new TurnQueue(std::move(work), {});
     ::pthread_sigmask(SIG_SETMASK, &former, nullptr);
-    return failures;
+    return queue;
 }
 
-// A ban waits for whoever changes settings, who may be waiting for this supervisor: the listener only notes
-// whom it is about. The queue is never destroyed, which would wait for that ban.
-DaemonProcess::Listener listenFor(const std::string& service, Reader read) {
-    return [failures = startCounting(service), read](std::string_view message) {
-        if (const auto address = read(message)) {
+// A ban, and the log, wait for whoever changes settings, who may be waiting for this supervisor: the listener
+// only notes what it heard. The queues are never destroyed, which would wait for what they do.
+DaemonProcess::Listener listenFor(const std::string& service, const Readers& readers) {
+    auto* const failures = startQueue([service](const std::string& address) { count(service, address); });
+    auto* const refusals = startQueue([name = readers.name, reasons = std::make_shared<ReasonsOfLate>()](
+                                          const std::string& item) { log(name, item, *reasons); });
+    return [failures, refusals, readers](std::string_view message) {
+        if (const auto address = readers.failed(message)) {
             failures->add(toText(sourceOf(*address)), toText(*address));
+        } else if (const auto refused = readers.refused(message)) {
+            refusals->add(refused->reason, refused->user + '\n' + refused->reason);
         }
     };
 }
@@ -57,9 +93,10 @@ DaemonProcess::Listener watchLogins(const std::filesystem::path& folder, const s
     const std::string root = text.substr(0, text.size() - paths::run.size());
     setStateRoot(root.empty() ? "/" : root);
     if (daemon == "ftpd") {
-        return listenFor("ftp", failedFtpLogin);
+        return listenFor("ftp", {failedFtpLogin, refusedFtpLogin, "FTP"});
     }
-    return daemon == "sftp" ? listenFor("sftp", failedSftpLogin) : DaemonProcess::Listener();
+    return daemon == "sftp" ? listenFor("sftp", {failedSftpLogin, refusedSftpLogin, "SFTP"})
+                            : DaemonProcess::Listener();
 }
 
 } // namespace velt

@@ -1,4 +1,4 @@
-// Hears of failed logins from what a daemon writes.
+// Hears of failed and refused logins from what a daemon writes.
 #ifndef VELT_STANDALONE_SUPERVISE_LOGIN_WATCH_H
 #define VELT_STANDALONE_SUPERVISE_LOGIN_WATCH_H
 
@@ -9,8 +9,9 @@
 
 namespace velt {
 
-/// Counts the failed logins of this daemon against their addresses, in a thread of its own that goes on until
-/// the process ends, without destructors of static objects: by _exit(). To be called once. `folder` is that
+/// Counts the failed logins of this daemon against their addresses, and writes those that our own part of it
+/// refused into the administrator log, each reason once a minute. In threads of its own that go on until the
+/// process ends, without destructors of static objects: by _exit(). To be called once. `folder` is that
 /// of the files about running daemons: it shows which state root this process works for, which is set.
 /// Nothing listens when the folder is not that of a state root.
 DaemonProcess::Listener watchLogins(const std::filesystem::path& folder, const std::string& daemon);

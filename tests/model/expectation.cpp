@@ -1,5 +1,6 @@
 #include "tests/model/expectation.h"
 
+#include "base/text.h"
 #include "tests/model/view_path.h"
 
 namespace velt::model {
@@ -11,7 +12,7 @@ const Expectation undecided{Verdict::undecided, {}, {}, {}};
 class Oracle {
 public:
     Oracle(const Tree& tree, const View& view, const Account& account, const std::string& data)
-        : tree_(tree), account_(account), paths_(tree, view, account), data_(data) {}
+        : tree_(tree), account_(account), kept_(view.kept), paths_(tree, view, account), data_(data) {}
 
     Expectation enter(const std::string& path) const;
     Expectation list(const std::string& path) const;
@@ -30,7 +31,14 @@ private:
     bool mayChange(const Target& target) const {
         const std::string place = join(target.folder.place, target.name);
         return !isObeyed({target.folder.mount, place}) && place != account_.home &&
-               paths_.lets(target.folder, toWrite | toEnter);
+               !isKept(target.folder.place, place) && paths_.lets(target.folder, toWrite | toEnter);
+    }
+    /// Whether a rule depends on what has this name, or on nothing having it.
+    bool isKept(const std::string& folder, const std::string& place) const {
+        const Node* const around = tree_.at(folder);
+        const Node* const node = tree_.at(place);
+        return (node != nullptr && node->id != 0 && kept_.objects.contains(node->id)) ||
+               (around != nullptr && kept_.absent.contains({around->id, lowerCase(nameOf(place))}));
     }
     bool mayWrite(const Target& target) const {
         return target.reached == Reached::nothing
@@ -44,6 +52,7 @@ private:
 
     const Tree& tree_;
     const Account& account_;
+    const KeptNames& kept_;
     ViewPaths paths_;
     const std::string& data_;
 };

@@ -1,5 +1,7 @@
 #include "tests/model/policy.h"
 
+#include "base/text.h"
+
 #include <algorithm>
 #include <stdexcept>
 
@@ -38,6 +40,8 @@ private:
     std::optional<View> guests() const;
 
     void mount(View& view, Mount shown, const std::string& place) const;
+    void keepRuleFolders(KeptNames& kept, const std::string& shown) const;
+    void keepWay(KeptNames& kept, std::string here, std::vector<std::string> rest) const;
     void addLimits(View& view) const;
 
     const World& world_;
@@ -203,6 +207,9 @@ std::optional<View> Policy::guests() const {
 void Policy::mount(View& view, Mount shown, const std::string& place) const {
     std::map<std::string, int> mounted{{place, static_cast<int>(view.mounts.size())}};
     view.mounts.push_back(shown);
+    if (shown.access == Access::write) {
+        keepRuleFolders(view.kept, place);
+    }
     std::set<std::string> pinned;
     for (const Place& inner : places_) {
         for (std::string way = inner.path; inner.found && isStrictlyWithin(way, place); way = parentOf(way)) {
@@ -222,6 +229,53 @@ void Policy::mount(View& view, Mount shown, const std::string& place) const {
         mounted[folder] = static_cast<int>(view.mounts.size());
         const std::uint64_t id = world_.tree.at(folder)->id;
         view.mounts.push_back({outer, id, "", id, access});
+    }
+}
+
+void Policy::keepWay(KeptNames& kept, std::string here, std::vector<std::string> rest) const {
+    for (int links = 0; !rest.empty() && links <= 40;) {
+        const std::string name = rest.front();
+        rest.erase(rest.begin());
+        const std::string place = join(here, name);
+        const Node* const node = world_.tree.at(place);
+        if (node == nullptr) {
+            kept.absent.insert({world_.tree.at(here)->id, lowerCase(name)});
+            return;
+        }
+        kept.objects.insert(node->id);
+        if (node->kind == Kind::file) {
+            return;
+        }
+        if (node->kind == Kind::folder) {
+            here = place;
+            continue;
+        }
+        auto target = partsOf(node->text);
+        if (node->text.starts_with('/') || std::ranges::find(target, "..") != target.end()) {
+            return;
+        }
+        links++;
+        target.insert(target.end(), rest.begin(), rest.end());
+        rest = target;
+    }
+}
+
+// Whoever moved one of them could put another in its place.
+void Policy::keepRuleFolders(KeptNames& kept, const std::string& shown) const {
+    for (const Rule& rule : world_.rules) {
+        auto parts = partsOf(rule.path);
+        const auto share = std::ranges::find(world_.shares, parts.at(0), &Share::name);
+        const auto number = static_cast<std::size_t>(share - world_.shares.begin());
+        if (rule.path == "/home" || share == world_.shares.end() || !places_[number].found) {
+            continue;
+        }
+        std::string place = places_[number].path;
+        for (auto part = parts.begin() + 1; part != parts.end(); ++part) {
+            place = join(place, *part);
+        }
+        if (parts.size() > 1 && isStrictlyWithin(place, shown)) {
+            keepWay(kept, shown, partsOf(shown == "/" ? place : place.substr(shown.size())));
+        }
     }
 }
 

@@ -5,6 +5,8 @@
 
 #include "tests/model/tree.h"
 
+#include <utility>
+
 namespace velt::model {
 
 enum class Access {
@@ -63,8 +65,16 @@ struct Limit {
     Access access = Access::none;
 };
 
+/// What chroot rules depend on within the folders of a view that may be written: folders and links on the way
+/// of a rule, and names at which nothing stands.
+struct KeptNames {
+    std::set<std::uint64_t> objects;
+    std::set<std::pair<std::uint64_t, std::string>> absent; ///< of a folder; the name in small letters
+};
+
 struct View {
     bool sideBySide = false;
+    KeptNames kept;
     std::vector<Mount> mounts; ///< the root first, unless several folders stand side by side
     std::vector<Limit> limits; ///< whatever the mounts are: see mayReach
 };

@@ -126,8 +126,9 @@ void renderTls(Text& text, const FtpSettings& settings, const ProftpdPlaces& pla
     text.line(certificate, places.certificate);
     text.line(key, places.certificateKey);
     text.line("TLSCertificateChainFile", places.certificate);
-    // Many clients do not resume the control connection's session for data and would get "425".
-    text.line("TLSOptions NoSessionReuseRequired");
+    // Many clients do not resume the control connection's session for data and would get "425". By the
+    // variables sessions know their version and cipher.
+    text.line("TLSOptions NoSessionReuseRequired StdEnvVars");
     if (settings.fipsOnly) {
         renderFipsAlgorithms(text);
     }
@@ -181,6 +182,9 @@ void renderLoginView(Text& text, const FtpSettings& settings, const ProftpdPlace
         text.line("VeltLoginView", places.loginProgram, places.stateRoot, kind, places.anonymousShare);
     } else {
         text.line("VeltLoginView", places.loginProgram, places.stateRoot, kind);
+    }
+    if (!places.configuration.empty()) {
+        text.line("VeltConfiguration", places.configuration);
     }
     // A daemon without root's rights cannot change the root directory: where it must, it refuses the login.
     if (!places.accountFiles || record.user_chroot != 0) {

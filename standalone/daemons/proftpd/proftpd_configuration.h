@@ -31,7 +31,8 @@ struct ProftpdPlaces {
     std::filesystem::path stateRoot;
     std::filesystem::path loginRoot; ///< an empty folder, on which the program shows what a login may see
     std::filesystem::path anonymousShare; ///< a file: names the share that anonymous users are confined to
-    std::filesystem::path certificate;    ///< needed where FTPS is on
+    std::string configuration; ///< the hash of this text without it, for the sessions to tell; "": left out
+    std::filesystem::path certificate; ///< needed where FTPS is on
     std::filesystem::path certificateKey;
     bool certificateIsRsa = false; ///< else it is an elliptic curve's
     std::string user = "proftpd";

@@ -85,6 +85,7 @@ Result<> writeSurroundings(const FtpSettings& settings, const ProftpdPlaces& pla
 Result<DaemonPlan> writePlan(const FtpSettings& settings, FtpSurroundings found, const std::string& hash) {
     const auto folder = found.places.runFolder / "configurations" / hash;
     found.places.anonymousShare = folder / "anonymous";
+    found.places.configuration = hash;
     VELT_RETURN_IF_ERROR(writeSurroundings(settings, found.places));
     const auto configuration = folder / "proftpd.conf";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, renderProftpd(settings, found.places), 0600));

@@ -16,11 +16,19 @@ struct SshdPlaces {
     std::string ownUser;                         ///< the user of this process, a plain name
     bool privileged = true;    ///< else the daemon serves its own user alone, with keys and without passwords
     bool loopbackOnly = false; ///< clients of this machine only, over IPv4
+    std::filesystem::path sessionRoot{}; ///< becomes the root directory of sessions; "" where they keep the
+                                         ///< server's
+};
+
+/// The settings of FTP that count here, too.
+struct SharedSettings {
+    bool umask = true; ///< 022, else none
+    bool fipsOnly = false;
 };
 
 /// The whole configuration: file transfer and nothing else. The settings have passed checkSftpSettings. A
 /// pure function.
-std::string renderSshd(const SftpSettings& settings, const SshdPlaces& places);
+std::string renderSshd(const SftpSettings& settings, const SharedSettings& shared, const SshdPlaces& places);
 
 } // namespace velt
 

@@ -10,16 +10,20 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/daemon_configuration.h"
+#include "standalone/daemons/sshd/confinement.h"
 #include "standalone/daemons/sshd/host_keys.h"
 #include "standalone/daemons/sshd/sshd_configuration.h"
 #include "standalone/daemons/tested_configurations.h"
-#include "standalone/settings/settings.h"
+#include "standalone/settings/settings_store.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <iterator>
+#include <utility>
 #include <vector>
 
 namespace velt {
@@ -52,6 +56,7 @@ Result<std::string> ownUser() {
 struct Rendering {
     std::string text;
     HostKeys keys;
+    std::vector<std::string> environment; ///< of the daemon, as arguments of env(1)
 };
 
 Result<Rendering> render(const SftpSettings& settings) {
@@ -62,15 +67,21 @@ Result<Rendering> render(const SftpSettings& settings) {
     VELT_RETURN_IF_ERROR(checkRenderable(keysProgram, keysProgram.parent_path()));
     VELT_ASSIGN_OR_RETURN(const auto user, ownUser());
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
+    VELT_ASSIGN_OR_RETURN(const auto ftp, loadFtpFile());
+    VELT_ASSIGN_OR_RETURN(auto confinement, prepareConfinement());
     std::string text =
-        renderSshd(settings, {keys.files, keysProgram, user, geteuid() == 0, network.loopbackOnly});
-    return Rendering{std::move(text), std::move(keys)};
+        renderSshd(settings, {ftp.umask, ftp.fipsOnly},
+                   {keys.files, keysProgram, user, geteuid() == 0, network.loopbackOnly, confinement.root});
+    return Rendering{std::move(text), std::move(keys), std::move(confinement.environment)};
 }
 
-Result<> runTest(const std::string& text) {
+Result<> runTest(const Rendering& rendering) {
+    if (!rendering.environment.empty()) {
+        VELT_RETURN_IF_ERROR(checkCoverage());
+    }
     VELT_ASSIGN_OR_RETURN(const auto scratch, ScratchFolder::make());
     const auto configuration = scratch.path() / "sshd_config";
-    VELT_RETURN_IF_ERROR(replaceFile(configuration, text, 0600));
+    VELT_RETURN_IF_ERROR(replaceFile(configuration, rendering.text, 0600));
     return runConfigurationTest("SFTP", {program, "-t", "-f", configuration.string()});
 }
 
@@ -78,14 +89,33 @@ Result<> runTest(const std::string& text) {
 std::string hashOf(const Rendering& rendering) {
     std::vector<std::filesystem::path> files = rendering.keys.files;
     files.emplace_back(program);
-    return sha256(rendering.text + '\0' + identityOf(files));
+    std::string all = rendering.text;
+    if (!rendering.environment.empty()) {
+        std::ranges::move(filesOfConfinement(), std::back_inserter(files));
+    }
+    for (const std::string& variable : rendering.environment) {
+        all += '\0' + variable;
+    }
+    return sha256(all + '\0' + identityOf(files));
 }
 
 /// Returns the rendering's hash.
 Result<std::string> testRendering(const Rendering& rendering) {
     std::string hash = hashOf(rendering);
-    VELT_RETURN_IF_ERROR(testOnce(hash, [&] { return runTest(rendering.text); }));
+    VELT_RETURN_IF_ERROR(testOnce(hash, [&] { return runTest(rendering); }));
     return hash;
+}
+
+std::vector<std::string> commandLine(const Rendering& rendering, const std::string& hash,
+                                     const std::filesystem::path& configuration) {
+    std::vector<std::string> words;
+    if (!rendering.environment.empty()) {
+        words.emplace_back("/usr/bin/env");
+        std::ranges::copy(rendering.environment, std::back_inserter(words));
+        words.push_back("VELT_SESSION_CONFIGURATION=" + hash);
+    }
+    words.insert(words.end(), {program, "-D", "-e", "-f", configuration.string()});
+    return words;
 }
 
 } // namespace
@@ -104,7 +134,7 @@ Result<std::optional<DaemonPlan>> planSftpDaemon() {
     const auto folder = statePath(paths::sftpConfigurations) / hash;
     const auto configuration = folder / "sshd_config";
     VELT_RETURN_IF_ERROR(replaceFile(configuration, rendering.text, 0600));
-    return DaemonPlan{{hash, {settings.port}, {program, "-D", "-e", "-f", configuration.string()}}, folder};
+    return DaemonPlan{{hash, {settings.port}, commandLine(rendering, hash, configuration)}, folder};
 }
 
 } // namespace velt

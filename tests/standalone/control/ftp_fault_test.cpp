@@ -87,6 +87,9 @@ protected:
         sweep.act = [this, port, uploadRate] {
             runFormer();
             Client session(former_);
+            if (!session.isServed()) { // not only waiting at the daemon's socket
+                return std::string("There is no session.");
+            }
             ftpPort_ = port;
             storeFtp(plain, uploadRate);
             beginFaults();

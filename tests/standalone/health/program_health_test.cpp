@@ -1,4 +1,5 @@
 // What is found about the files of this system that services need.
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/settings/settings_store.h"
 #include "tests/standalone/health/health_test.h"
 #include "tests/standalone/support/state_folder.h"
@@ -87,6 +88,34 @@ TEST_F(ProgramHealth, TheModuleAndTheSupervisorAreNeededForTheNextStart) {
     EXPECT_EQ(found.at(0).sentence,
               program("mod_velt_login.so").string() + " is not a file. FTP cannot be started again.");
     EXPECT_EQ(found.at(2).subject, "sftp");
+}
+
+TEST_F(ProgramHealth, WhatConfinesSftpIsNeededWhereItIsConfined) {
+    std::filesystem::remove(program("velt-login-view"));
+    switchOn(false, true);
+    EXPECT_EQ(programFindings(), Findings());
+    ASSERT_EQ(messageOf(storeConfinementSettings({.sftp = true})), "");
+    const Findings found = programFindings();
+    EXPECT_EQ(summary(found), "error program-unusable, error program-unusable");
+    EXPECT_EQ(found.at(0).sentence, program("velt-login-view").string() +
+                                        " is missing. Nobody can log in over SFTP while it is confined.");
+    EXPECT_EQ(found.at(1).sentence, program("velt-sftp-session.so").string() +
+                                        " is missing. SFTP cannot be started again while it is confined.");
+}
+
+TEST_F(ProgramHealth, SftpThatIsNotConfinedIsWorthKnowing) {
+    EXPECT_EQ(
+        confinementFindings(),
+        (Findings{{"sftp-not-confined", Severity::notice, "sftp",
+                   "SFTP is not confined: its users see the whole server as far as Unix modes let them, "
+                   "whatever the rules and the shares grant.",
+                   "printf 'version = 1\\nsftp = 1\\n' >" +
+                       (root_.path() / "etc/velt/confinement.conf").string() + " && veltctl restart sftp"}}));
+    switchOn(true, false);
+    EXPECT_EQ(confinementFindings(), Findings()) << "nobody uses it";
+    switchOn(true, true);
+    ASSERT_EQ(messageOf(storeConfinementSettings({.sftp = true})), "");
+    EXPECT_EQ(confinementFindings(), Findings());
 }
 
 } // namespace

@@ -42,7 +42,8 @@ TEST_F(SettingsFileHealth, AValueThatNoDaemonTakesIsNamed) {
 }
 
 TEST_F(SettingsFileHealth, FilesThatCannotBeReadAreNamedWithTheLine) {
-    for (const char* file : {"network.conf", "bans.conf", "log.conf", "known_services.conf"}) {
+    for (const char* file :
+         {"network.conf", "bans.conf", "log.conf", "transfers.conf", "known_services.conf"}) {
         root_.write(std::string("etc/velt/") + file, "\njunk\n");
         const Findings found = settingsFileFindings();
         ASSERT_EQ(summary(found), "warning settings-damaged") << file;

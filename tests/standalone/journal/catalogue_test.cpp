@@ -16,12 +16,12 @@ TEST(Catalogue, KnowsEveryEventOnce) {
     for (const CatalogueEntry& entry : catalogue())
         events.insert(entry.event);
     EXPECT_EQ(events, (std::set<std::uint32_t>{
-                          0x11B00002, 0x11B00006, 0x11B00008, 0x11B00009, 0x11B0000A, 0x11B00010,
-                          0x11B00011, 0x11B00012, 0x11B00013, 0x11B00019, 0x11B00020, 0x11B00021,
-                          0x11B00022, 0x11B00024, 0x11B00025, 0x11B00026, 0x11B00027, 0x11B00028,
-                          0x11B00035, 0x11B00036, 0x11BF0001, 0x11BF0002, 0x11BF0003, 0x11BF0004,
-                          0x11BF0005, 0x11BF0006, 0x11BF0007, 0x11BF0008, 0x11BF0009, 0x11BF000A,
-                          0x11BF0010, 0x11BF0011, 0x11BF0012, 0x11BF0013, 0x11BF0014, 0x11BF0015}));
+                          0x11B00002, 0x11B00006, 0x11B00008, 0x11B00009, 0x11B0000A, 0x11B00010, 0x11B00011,
+                          0x11B00012, 0x11B00013, 0x11B00019, 0x11B00020, 0x11B00021, 0x11B00022, 0x11B00024,
+                          0x11B00025, 0x11B00026, 0x11B00027, 0x11B00028, 0x11B00035, 0x11B00036, 0x11BF0001,
+                          0x11BF0002, 0x11BF0003, 0x11BF0004, 0x11BF0005, 0x11BF0006, 0x11BF0007, 0x11BF0008,
+                          0x11BF0009, 0x11BF000A, 0x11BF000B, 0x11BF0010, 0x11BF0011, 0x11BF0012, 0x11BF0013,
+                          0x11BF0014, 0x11BF0015, 0x11BF0016}));
     EXPECT_EQ(events.size(), catalogue().size());
 }
 
@@ -53,6 +53,8 @@ TEST(Catalogue, PutsTheTextsWhereTheyBelong) {
     EXPECT_EQ(sentenceOf(0x11B00035, {"22", "222", "", ""}), "The SFTP port was changed from 22 to 222.");
     EXPECT_EQ(sentenceOf(0x11BF0001, {"192.0.2.1", "600", "10", "SFTP"}),
               "Logins from 192.0.2.1 are refused for 600 seconds after 10 failed ones at SFTP.");
+    EXPECT_EQ(sentenceOf(0x11BF000B, {"3f2-1", "anna", "192.0.2.1", ": too much"}),
+              "The session 3f2-1 of \"anna\" from 192.0.2.1 was ended: too much.");
     EXPECT_EQ(sentenceOf(0x11B00028, {}),
               "The share that anonymous FTP users are confined to was set to \"\".");
 }

@@ -4,6 +4,8 @@
 
 #include <gtest/gtest.h>
 
+#include <sched.h>
+#include <sys/mount.h>
 #include <sys/stat.h>
 
 extern "C" {
@@ -13,6 +15,7 @@ extern "C" {
 #include <cerrno>
 #include <chrono>
 #include <climits>
+#include <cstring>
 #include <filesystem>
 #include <string>
 
@@ -57,6 +60,18 @@ TEST_P(AccessFiles, areOthersWhenTheyAreReplaced) {
     fs::last_write_time(other, time);
     fs::rename(other, path());
     EXPECT_TRUE(changed()) << "size and time of writing are the same";
+}
+
+TEST_P(AccessFiles, areOthersWhileAnotherFileIsMountedOverThem) {
+    if (unshare(CLONE_NEWNS) != 0 || mount(nullptr, "/", nullptr, MS_REC | MS_PRIVATE, nullptr) != 0) {
+        GTEST_SKIP() << "no mount namespace: " << std::strerror(errno);
+    }
+    note();
+    const auto other = root_.write("other", root_.read(GetParam().substr(1)));
+    ASSERT_EQ(mount(other.c_str(), path().c_str(), nullptr, MS_BIND, nullptr), 0);
+    EXPECT_TRUE(changed());
+    ASSERT_EQ(umount2(path().c_str(), MNT_DETACH), 0);
+    EXPECT_FALSE(changed());
 }
 
 TEST_P(AccessFiles, areOthersWhenAFolderOnTheirWayIsExchanged) {

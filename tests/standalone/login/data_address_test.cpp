@@ -31,7 +31,7 @@ std::string eprt(const std::string& argument) {
 bool isInside(const std::string& text) {
     in6_addr address{};
     EXPECT_EQ(inet_pton(AF_INET6, text.c_str(), &address), 1) << text;
-    return velt_is_inside(&address) != 0;
+    return velt_is_inside(&address, nullptr) != 0;
 }
 
 TEST(DataAddress, isReadFromThePortCommand) {
@@ -60,16 +60,47 @@ TEST(DataAddress, isReadFromTheExtendedCommand) {
 }
 
 TEST(DataAddress, isInsideWhereItLeadsToThisServerOrToNobody) {
-    for (const char* inside :
-         {"::1", "::", "fe80::1", "febf::1", "ff02::1", "ff0e::1", "::ffff:127.0.0.1", "::ffff:127.255.0.1",
-          "::ffff:0.0.0.0", "::ffff:0.1.2.3", "::ffff:169.254.0.1", "::ffff:224.0.0.1", "::ffff:240.0.0.1",
-          "::ffff:255.255.255.255", "::127.0.0.1", "64:ff9b::7f00:1", "2002:7f00:1::1", "2002:a9fe:1::"}) {
+    for (const char* inside : {"::1",
+                               "::",
+                               "fe80::1",
+                               "febf::1",
+                               "ff02::1",
+                               "ff0e::1",
+                               "::ffff:127.0.0.1",
+                               "::ffff:127.255.0.1",
+                               "::ffff:0.0.0.0",
+                               "::ffff:0.1.2.3",
+                               "::ffff:169.254.0.1",
+                               "::ffff:224.0.0.1",
+                               "::ffff:240.0.0.1",
+                               "::ffff:255.255.255.255",
+                               "::127.0.0.1",
+                               "64:ff9b::7f00:1",
+                               "2002:7f00:1::1",
+                               "2002:a9fe:1::",
+                               "64:ff9b:1::7f00:1",
+                               "64:ff9b:1:2:3:4:7f00:1",
+                               "::ffff:0:7f00:1",
+                               "2001:0:c633:6409:0:0:80ff:fffe",
+                               "2001:0:7f00:1:0:0:39cc:9bf6"}) {
         EXPECT_TRUE(isInside(inside)) << inside;
     }
-    for (const char* outside : {"::ffff:198.51.100.9", "::ffff:169.253.0.1", "::ffff:169.255.0.1",
-                                "::ffff:126.255.255.255", "::ffff:128.0.0.1", "::ffff:223.255.255.255",
-                                "2001:db8::9", "fec0::1", "64:ff9b::c633:6409", "2002:c633:6409::1"}) {
+    for (const char* outside :
+         {"::ffff:198.51.100.9", "::ffff:169.253.0.1", "::ffff:169.255.0.1", "::ffff:126.255.255.255",
+          "::ffff:128.0.0.1", "::ffff:223.255.255.255", "2001:db8::9", "fec0::1", "64:ff9b::c633:6409",
+          "2002:c633:6409::1", "::ffff:0:c633:6409", "2001:0:c633:6409:0:0:39cc:9bf6"}) {
         EXPECT_FALSE(isInside(outside)) << outside;
+    }
+}
+
+TEST(DataAddress, isInsideWhereItIsTheOneOutsideInAnyForm) {
+    in6_addr external{};
+    ASSERT_EQ(inet_pton(AF_INET6, "::ffff:203.0.113.9", &external), 1);
+    for (const char* const text : {"::ffff:203.0.113.9", "64:ff9b::cb00:7109", "2002:cb00:7109::"}) {
+        in6_addr address{};
+        ASSERT_EQ(inet_pton(AF_INET6, text, &address), 1);
+        EXPECT_NE(velt_is_inside(&address, &external), 0) << text;
+        EXPECT_EQ(velt_is_inside(&address, nullptr), 0) << text;
     }
 }
 

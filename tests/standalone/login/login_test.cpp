@@ -246,12 +246,12 @@ TEST_F(LoginModule, letsNoFileRunWithItsOwnersRights) {
     };
     EXPECT_EQ(change_mode_as_the_daemon(file.c_str(), 0751), 0);
     EXPECT_EQ(modeOf(), 0751U);
-    EXPECT_EQ(change_mode_of_open_file_as_the_daemon(opened.get(), 01640), 0);
+    EXPECT_EQ(change_mode_of_open_file_as_the_daemon(file.c_str(), opened.get(), 01640), 0);
     EXPECT_EQ(modeOf(), 01640U);
     for (const unsigned mode : {04640U, 02640U, 06777U}) {
         EXPECT_EQ(change_mode_as_the_daemon(file.c_str(), mode), -1) << mode;
         EXPECT_EQ(errno, EPERM);
-        EXPECT_EQ(change_mode_of_open_file_as_the_daemon(opened.get(), mode), -1) << mode;
+        EXPECT_EQ(change_mode_of_open_file_as_the_daemon(file.c_str(), opened.get(), mode), -1) << mode;
     }
     EXPECT_EQ(modeOf(), 01640U);
 }

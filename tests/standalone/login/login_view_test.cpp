@@ -87,8 +87,8 @@ TEST_F(LoginView, givesNoMoreThanReadingWhereTheDaemonNeverWrites) {
     const auto remarks = makeLoginView(login_, view_);
     ASSERT_TRUE(remarks) << messageOf(remarks);
     EXPECT_EQ(*remarks, (std::vector<std::string>{
-                            "The share etc is read-only over FTP, since system folders have this name.",
-                            "The share Lib is read-only over FTP, since system folders have this name."}));
+                            "The share etc is read-only in sessions, since system folders have this name.",
+                            "The share Lib is read-only in sessions, since system folders have this name."}));
     const auto isReadOnly = [&](const char* share) {
         return mkdir((view_ / share / "made").c_str(), 0755) < 0 && errno == EROFS;
     };

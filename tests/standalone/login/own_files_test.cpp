@@ -48,11 +48,41 @@ TEST_F(OwnFiles, areKnownByName) {
         EXPECT_EQ(content(kept), "kept") << kept;
         EXPECT_EQ(name(kept), "kept") << kept;
     }
-    for (const char* free :
-         {"ssh", ".ssh2", ".sh", ".", "profile", ".profil", "binary", ".zsh", ".qmai", "x.forward"}) {
+    for (const char* free : {"ssh", ".", "profile", "binary", "x.forward", "startwm", "bin2"}) {
         EXPECT_EQ(content(free), "") << free;
     }
     EXPECT_EQ(refusal(folder_.path() / ".profile", velt_changes_name), "") << "no home";
+}
+
+// No list of programs is whole.
+TEST_F(OwnFiles, areAllThatBeginWithADot) {
+    keep();
+    for (const char* kept : {".selected_editor", ".tmux.conf", ".vimrc", ".fetchmailrc", ".muttrc", ".x",
+                             "...", ".env", ".part", ".Ab12Cd", ".bashrc.tmp", ".zshrc.Ab12Cd", ".ssh.",
+                             ".letter.Ab12C", ".letter.Ab12Cde", ".letter.Ab_2Cd"}) {
+        EXPECT_EQ(content(kept), "kept") << kept;
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    for (const char* free :
+         {"._letter", ".DS_Store", ".Trash-1000", ".in.letter.", ".htaccess", ".well-known", ".~lock.letter#",
+          ".letter.txt.part", ".letter.FILEPART", ".letter.txt.Ab12Cd", ".letter.tmp", ".fuse_hidden00001"}) {
+        EXPECT_EQ(content(free), "") << free;
+        EXPECT_EQ(name(free), "") << free;
+    }
+    fs::create_directories(home() / "other");
+    EXPECT_EQ(name("other/.selected_editor"), "") << "only the home's own";
+}
+
+TEST_F(OwnFiles, areWhatLiesInFoldersThatBeginWithADot) {
+    fs::create_directories(home() / ".elvish/lib");
+    fs::create_directories(home() / ".well-known/x");
+    keep();
+    fs::create_directories(home() / ".fizsh/deep");
+    for (const char* kept : {".elvish/rc.elv", ".elvish/lib/x", ".fizsh/.zshrc", ".fizsh/deep/x"}) {
+        EXPECT_EQ(content(kept), "kept") << kept << ", also where the folder was made after the login";
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    EXPECT_EQ(content(".well-known/x/y"), "");
 }
 
 struct Family {
@@ -156,6 +186,55 @@ TEST_F(OwnFiles, areKnownBehindLinks) {
     EXPECT_EQ(content("dots/file"), "");
     EXPECT_EQ(content("dots"), "") << "its mode";
     EXPECT_EQ(content("turn"), std::to_string(ELOOP));
+}
+
+// As programs lay them that keep all such files in one folder.
+TEST_F(OwnFiles, areKnownBehindLinksWithinTheirFolders) {
+    fs::create_directories(home() / "dots/systemd/user");
+    fs::create_directories(home() / ".ssh");
+    fs::create_directories(home() / ".config/a/b/c");
+    folder_.write("home/dots/authorized_keys", "");
+    folder_.write("home/dots/deep", "");
+    folder_.write("home/dots/zwc", "");
+    fs::create_symlink("../dots/authorized_keys", home() / ".ssh/authorized_keys");
+    fs::create_directory_symlink("../dots/systemd", home() / ".config/systemd");
+    fs::create_symlink(home() / "dots/deep", home() / ".config/a/b/c/deep");
+    fs::create_symlink("dots/zwc", home() / ".zshrc.zwc");
+    fs::create_directory_symlink("dots/elvish", home() / ".elvish");
+    keep();
+    for (const char* kept : {"dots/authorized_keys", ".ssh/authorized_keys", "dots/systemd/user/x.service",
+                             ".config/systemd/user/x.service", "dots/deep", "dots/zwc", "dots/elvish"}) {
+        EXPECT_EQ(content(kept), "kept") << kept;
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    EXPECT_EQ(content("dots/free"), "");
+    EXPECT_EQ(name("dots"), "kept");
+}
+
+TEST_F(OwnFiles, areKnownBehindLinksThatLeadNowhereYet) {
+    fs::create_directories(home() / "dots");
+    fs::create_directories(home() / ".ssh");
+    fs::create_symlink("dots/absent", home() / ".bash_aliases");
+    fs::create_symlink("../dots/keys", home() / ".ssh/authorized_keys");
+    keep();
+    for (const char* kept : {"dots/absent", "dots/ABSENT", "dots/keys"}) {
+        EXPECT_EQ(content(kept), "kept") << kept;
+        EXPECT_EQ(name(kept), "kept") << kept;
+    }
+    EXPECT_EQ(name("dots/other"), "");
+}
+
+TEST_F(OwnFiles, doNotCloseTheHomeByALinkToAllOfIt) {
+    fs::create_directories(home() / ".config");
+    fs::create_directory_symlink(home(), home() / ".config/home");
+    fs::create_directory_symlink("/", home() / ".local");
+    fs::create_directory_symlink(".", home() / ".all");
+    fs::create_directories(folder_.path() / "data");
+    fs::create_directory_symlink(folder_.path() / "data", home() / ".data");
+    keep();
+    EXPECT_EQ(name("free"), "");
+    EXPECT_EQ(refusal(folder_.path() / "data/free", velt_changes_name), "") << "nobody is known to obey it";
+    EXPECT_EQ(name(".data"), "kept");
 }
 
 TEST_F(OwnFiles, areThoseOfALinkedHome) {

@@ -220,6 +220,50 @@ int pr_event_register(module* m, const char* event, listener told, void* data) {
     return 0;
 }
 
+const void* pr_table_get(pr_table_t* table, const char* key, size_t* size) {
+    (void)table;
+    (void)key;
+    (void)size;
+    return NULL;
+}
+
+char* pr_env_get(pool* p, const char* name) {
+    (void)p;
+    (void)name;
+    return NULL;
+}
+
+char* pr_fs_decode_path(pool* p, const char* path) {
+    return pstrdup(p, path);
+}
+
+int pr_timer_add(int seconds, int number, module* m, callback_t call, const char* words) {
+    (void)seconds;
+    (void)number;
+    (void)m;
+    (void)call;
+    (void)words;
+    return -1;
+}
+
+int pr_timer_remove(int number, module* m) {
+    (void)number;
+    (void)m;
+    return -1;
+}
+
+int pr_response_get_last(pool* p, const char** code, const char** words) {
+    (void)p;
+    (void)code;
+    (void)words;
+    return -1;
+}
+
+const char* pr_session_get_disconnect_reason(const char** details) {
+    (void)details;
+    return NULL;
+}
+
 pr_fs_t* pr_get_fs(const char* path, int* exact) {
     (void)path;
     *exact = TRUE;
@@ -291,10 +335,11 @@ int change_mode_as_the_daemon(const char* path, unsigned mode) {
     return files.chmod(&files, path, (mode_t)mode);
 }
 
-int change_mode_of_open_file_as_the_daemon(int descriptor, unsigned mode) {
+int change_mode_of_open_file_as_the_daemon(const char* path, int descriptor, unsigned mode) {
     pr_fh_t file;
     memset(&file, 0, sizeof(file));
     file.fh_fs = &files;
+    file.fh_path = (char*)path;
     return files.fchmod(&file, descriptor, (mode_t)mode);
 }
 

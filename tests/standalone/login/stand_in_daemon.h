@@ -32,7 +32,7 @@ enum login_end change_root_unasked(const struct login_world* world);
 
 /* What a session's command to change a mode comes to, after a login. 0, or -1 with errno. */
 int change_mode_as_the_daemon(const char* path, unsigned mode);
-int change_mode_of_open_file_as_the_daemon(int descriptor, unsigned mode);
+int change_mode_of_open_file_as_the_daemon(const char* path, int descriptor, unsigned mode);
 
 /* What the daemon's functions for files come to, after a login. As the system calls of these names; the last
  * one tries both kinds of links, and gives the sum. */

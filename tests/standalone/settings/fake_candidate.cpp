@@ -32,4 +32,13 @@ Result<std::string> testSftpCandidate(const SftpSettings& settings) {
     return answer();
 }
 
+// No daemon runs that could follow a change.
+Result<std::optional<DaemonPlan>> planFtpDaemon() {
+    return std::nullopt;
+}
+
+Result<std::optional<DaemonPlan>> planSftpDaemon() {
+    return std::nullopt;
+}
+
 } // namespace velt

@@ -1,6 +1,7 @@
 #include "platform/core.h"
 #include "platform/sftp.h"
 #include "standalone/rules/rule_store.h"
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/settings/settings.h"
 #include "standalone/settings/settings_files.h"
 #include "standalone/settings/settings_store.h"
@@ -31,6 +32,34 @@ TEST_F(SettingsStore, ALaterOpeningLeavesWhatIsThere) {
     ASSERT_EQ(messageOf(openState(root_.path())), "");
     EXPECT_EQ(root_.read("etc/velt/ftp.conf"), "damaged");
     EXPECT_EQ(root_.read("etc/velt/sftp.conf"), formatSettings(sftpSettingsFile(), defaultSftpSettings()));
+}
+
+TEST_F(SettingsStore, TheFirstOpeningOfANewServerConfinesSftp) {
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
+    EXPECT_TRUE(loadConfinementSettings()->sftp);
+    ASSERT_EQ(messageOf(storeConfinementSettings({.sftp = false})), "");
+    std::filesystem::remove(place("/var/lib/velt/initialized"));
+    ASSERT_EQ(messageOf(openState(root_.path())), "");
+    EXPECT_FALSE(loadConfinementSettings()->sftp) << "its administrator has decided";
+}
+
+TEST_F(SettingsStore, AServerOfAFormerVersionServesSftpAsBefore) {
+    for (const char* trace : {"etc/velt/ftp.conf", "etc/velt/sftp.conf", "var/lib/velt/initialized"}) {
+        const test::TemporaryFolder root;
+        root.write(trace, "");
+        ASSERT_EQ(messageOf(openState(root.path())), "");
+        EXPECT_FALSE(loadConfinementSettings()->sftp) << trace;
+        EXPECT_FALSE(std::filesystem::exists(root.path() / "etc/velt/confinement.conf")) << trace;
+    }
+    setStateRoot(root_.path());
+}
+
+TEST_F(SettingsStore, TheConfinementIsReadStrictly) {
+    for (const char* text :
+         {"sftp = 1\n", "version = 1\nsftp = yes\n", "version = 1\n", "version = 1\nsftp = 1\nftp = 1\n"}) {
+        root_.write("etc/velt/confinement.conf", text);
+        EXPECT_FALSE(loadConfinementSettings()) << text;
+    }
 }
 
 TEST_F(SettingsStore, TheFirstOpeningMakesAnEmptySetOfRulesAndLaterOnesMissIt) {

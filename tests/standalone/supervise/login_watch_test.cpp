@@ -5,6 +5,8 @@
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
+#include "standalone/journal/admin_log.h"
+#include "standalone/supervise/refused_logins.h"
 #include "tests/standalone/supervise/daemon_test.h"
 #include "tests/support/ports.h"
 #include "tests/support/result.h"
@@ -89,6 +91,46 @@ TEST_F(LoginWatch, ADaemonsWordsAreReadAsItsOwnOnly) {
     EXPECT_EQ(bannedAfter(ftpDaemon, {"Failed password for alice from 192.0.2.7 port 53076 ssh2\r\n"}),
               nobody);
     EXPECT_EQ(bannedAfter(sftpDaemon, {head + "mod_velt_login: password refused from 192.0.2.7\n"}), nobody);
+}
+
+TEST_F(LoginWatch, RefusedLoginsAreLoggedOnceForEachReason) {
+    const std::string damaged = "shares.json: invalid JSON.";
+    const auto refusedAt = [](const std::string& user, const std::string& why) {
+        return "velt-sftp-session: login of '" + user + "' refused: " + why + "\n";
+    };
+    bannedAfter(sftpDaemon, {refusedAt("alice", damaged), refusedAt("bob", damaged),
+                             refusedAt("bob", "The share data grants the user no access."),
+                             "Invalid user velt-sftp-session: login of 'root' refused: no from 192.0.2.7\r\n",
+                             "velt-sftp-session: login of 'bob': a remark\n"});
+    bannedAfter(ftpDaemon, {head + "mod_velt_login/2.0: login of 'alice' refused: " + damaged + "\n",
+                            refusedAt("carol", damaged)});
+    std::set<std::string> logged;
+    EXPECT_TRUE(waitUntil(
+        [&] {
+            LogFilter filter;
+            filter.event = 0x11BF0016;
+            logged.clear();
+            for (const LogEntry& entry : queryLog(filter).valueOr({})) {
+                logged.insert(entry.sentence);
+            }
+            return logged.size() >= 3;
+        },
+        patience));
+    EXPECT_EQ(logged, (std::set<std::string>{
+                          "A login of \"alice\" over FTP was refused: " + damaged,
+                          "A login of \"alice\" over SFTP was refused: " + damaged,
+                          "A login of \"bob\" over SFTP was refused: The share data grants the user no "
+                          "access."}));
+}
+
+TEST_F(LoginWatch, AReasonIsToldAgainAfterAMinute) {
+    ReasonsOfLate reasons;
+    const ReasonsOfLate::Clock::time_point start{};
+    EXPECT_TRUE(reasons.isNew("one", start));
+    EXPECT_TRUE(reasons.isNew("other", start + std::chrono::seconds(30)));
+    EXPECT_FALSE(reasons.isNew("one", start + std::chrono::seconds(59)));
+    EXPECT_TRUE(reasons.isNew("one", start + std::chrono::seconds(60)));
+    EXPECT_FALSE(reasons.isNew("other", start + std::chrono::seconds(60)));
 }
 
 TEST_F(LoginWatch, GuessesDoNotKeepTheSupervisorFromAnswering) {

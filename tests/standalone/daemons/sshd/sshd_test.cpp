@@ -20,19 +20,30 @@ const SshdPlaces examplePlaces{{"/var/lib/velt/ssh/host_ed25519_key", "/var/lib/
                                true};
 
 TEST(SshdRendering, isAsRecorded) {
-    expectGolden(GOLDEN_FOLDER "/sftp.conf", renderSshd({true, 2222}, examplePlaces));
+    expectGolden(GOLDEN_FOLDER "/sftp.conf", renderSshd({true, 2222}, {}, examplePlaces));
 }
 
 TEST(SshdRendering, isAsRecordedWithoutRootsRights) {
     SshdPlaces places = examplePlaces;
     places.privileged = false;
-    expectGolden(GOLDEN_FOLDER "/sftp_unprivileged.conf", renderSshd({true, 2222}, places));
+    expectGolden(GOLDEN_FOLDER "/sftp_unprivileged.conf", renderSshd({true, 2222}, {}, places));
 }
 
 TEST(SshdRendering, isAsRecordedForTheLoopbackOnly) {
     SshdPlaces places = examplePlaces;
     places.loopbackOnly = true;
-    expectGolden(GOLDEN_FOLDER "/sftp_loopback.conf", renderSshd({true, 2222}, places));
+    expectGolden(GOLDEN_FOLDER "/sftp_loopback.conf", renderSshd({true, 2222}, {}, places));
+}
+
+TEST(SshdRendering, isAsRecordedForConfinedSessions) {
+    SshdPlaces places = examplePlaces;
+    places.sessionRoot = "/run/sshd/.";
+    expectGolden(GOLDEN_FOLDER "/sftp_confined.conf", renderSshd({true, 2222}, {}, places));
+}
+
+TEST(SshdRendering, isAsRecordedWithOtherSettingsOfFtp) {
+    expectGolden(GOLDEN_FOLDER "/sftp_fips.conf",
+                 renderSshd({true, 2222}, {.umask = false, .fipsOnly = true}, examplePlaces));
 }
 
 class SftpCandidate : public testing::Test {
