@@ -83,6 +83,15 @@ HttpLimits possibleLimits(const Config& config, HostLog& log) {
     return limits;
 }
 
+/// While it lives, what sessions do is taken over and told.
+class ActivityReading {
+public:
+    ActivityReading() { velt::startActivityReader(); }
+    ~ActivityReading() { velt::stopActivityReader(); }
+    ActivityReading(const ActivityReading&) = delete;
+    ActivityReading& operator=(const ActivityReading&) = delete;
+};
+
 void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     if (const auto opened = velt::openState(config.stateRoot); !opened) {
         throw velt::host::ConfigError(opened.error().message);
@@ -110,6 +119,7 @@ void serve(const Config& config, const sigset_t& signals, HostLog& log) {
     if (const auto watched = velt::watchServices(); !watched) {
         log.write(watched.error().message);
     }
+    const ActivityReading reading;
     server.start(config.ioThreads);
     if (config.printReady) {
         std::printf("%s\n", velt::host::toJson(ready).c_str());

@@ -4,9 +4,12 @@
 #include "host/api/log_page.h"
 #include "host/api/problem.h"
 #include "host/api/restart.h"
+#include "host/api/sessions.h"
 #include "host/api/settings_diff.h"
 #include "host/api/status.h"
 #include "host/api/tokens.h"
+#include "host/api/transfers.h"
+#include "host/api/user_access.h"
 #include "host/base/percent_encoding.h"
 #include "host/base/random_text.h"
 
@@ -81,8 +84,9 @@ private:
 App::App(const AppSettings& settings, const ModuleTable& table, HostLog& log)
     : log_(log), tokens_(settings.tokenFile), wrongTokens_(log),
       access_(settings.access, tokens_, wrongTokens_, log), platformEvents_(events_),
-      changes_(table, metrics_, events_, log), rows_(table, openApi_, metrics_, changes_, log),
-      settings_(table, openApi_, changes_), history_(table, settings_, log),
+      activityEvents_(events_), changes_(table, metrics_, events_, log),
+      rows_(table, openApi_, metrics_, changes_, log), settings_(table, openApi_, changes_),
+      history_(table, settings_, log),
       order_(settings.workers, settings.maxWaiting, settings.maxWaitingBytes) {
     addRoutes(table);
 }
@@ -109,10 +113,13 @@ void App::addRoutes(const ModuleTable& table) {
     add(settingsDiffRoutes(table));
     add({restartRoute(log_)});
     add(statusRoutes(table));
+    add(accessRoutes());
     add(banRoutes(log_));
+    add(sessionRoutes(log_));
     add(tokenRoutes(tokens_, events_, log_));
     add(healthRoutes(health_));
-    add({logRoute(), metricsRoute(metrics_, table, events_, health_), openApiRoute(openApi_), eventRoute()});
+    add({logRoute(), transferRoute(), metricsRoute(metrics_, table, events_, health_), openApiRoute(openApi_),
+         eventRoute()});
 }
 
 std::optional<Refusal> App::checkAccess(const HttpRequest& head, const Peer& peer, Principal& principal) {
@@ -142,11 +149,13 @@ std::size_t App::bodyLimit(const HttpRequest& head, const Principal& principal) 
 }
 
 bool App::asksForEvents(const HttpRequest& request) const {
-    return asksFor(request, [](const Route& each) { return !each.answer; });
+    return asksFor(request,
+                   [&request](const Route& each) { return each.isStream && each.isStream(request.query()); });
 }
 
-void App::addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) {
-    events_.add(reader, principal.tokenId);
+void App::addEventReader(const std::shared_ptr<EventReader>& reader, const HttpRequest& request,
+                         const Principal& principal) {
+    events_.add(reader, principal.tokenId, kindsIn(request.query()));
     // It may have been deleted since it was looked at, when the hub did not know of its reader yet.
     if (!principal.tokenId.empty() && !tokens_.has(principal.tokenId)) {
         reader->end();

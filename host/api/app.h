@@ -3,6 +3,7 @@
 #define VELT_HOST_API_APP_H
 
 #include "host/api/access_control.h"
+#include "host/api/activity_events.h"
 #include "host/api/all_settings.h"
 #include "host/api/confirmation_watch.h"
 #include "host/api/events.h"
@@ -48,7 +49,8 @@ public:
     bool asksForEvents(const HttpRequest& request) const override;
     void handle(HttpRequest request, const Principal& principal, Done done) override;
     HttpResponse failure(int status, const std::string& detail) override;
-    void addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) override;
+    void addEventReader(const std::shared_ptr<EventReader>& reader, const HttpRequest& request,
+                        const Principal& principal) override;
 
     /// Settles what a former process left of its changes, and takes back those that nobody confirms in time.
     /// Called once, after what was left half-way was undone and before requests come.
@@ -83,6 +85,7 @@ private:
     HealthMonitor health_;
     EventHub events_;
     PlatformEvents platformEvents_;
+    ActivityEvents activityEvents_;
     Changes changes_;
     Rows rows_;
     AllSettings settings_;

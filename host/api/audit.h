@@ -21,6 +21,7 @@ enum class AuditEvent : unsigned {
     restarted = 0x11BF0008,
     takenBackInPart = 0x11BF0009,
     superseded = 0x11BF000A,
+    sessionEnded = 0x11BF000B,
 };
 
 struct AuditEntry {

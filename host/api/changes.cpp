@@ -75,9 +75,10 @@ Json::Value toObject(const ChangeReport& report) {
     return object;
 }
 
-HttpResponse dryRunAnswer(ChangeSteps steps) {
+HttpResponse dryRunAnswer(ChangeSteps steps, int sessionsEnded) {
     ChangeReport report;
     report.dryRun = true;
+    report.sessionsEnded = sessionsEnded;
     report.steps = std::move(steps);
     return jsonResponse(200, toObject(report));
 }

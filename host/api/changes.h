@@ -49,7 +49,7 @@ struct ChangeReport {
 Json::Value toObject(const ChangeReport& report);
 
 /// The answer to a dry run of something that is not a change of settings.
-HttpResponse dryRunAnswer(ChangeSteps steps);
+HttpResponse dryRunAnswer(ChangeSteps steps, int sessionsEnded = 0);
 
 /// Thread-safe, if one change runs at a time.
 class Changes {

@@ -2,6 +2,7 @@
 #ifndef VELT_HOST_API_EVENTS_H
 #define VELT_HOST_API_EVENTS_H
 
+#include "host/api/problem.h"
 #include "host/api/route.h"
 #include "host/http/message.h"
 #include "standalone/standalone.h"
@@ -11,16 +12,31 @@
 #include <cstddef>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <string>
+#include <variant>
 #include <vector>
 
 namespace velt::host {
 
-/// Delivers each event to everybody who reads the stream of events. Thread-safe.
+/// "service", "log", ...
+using EventKinds = std::set<std::string>;
+
+/// Those of who asks for none: all but what users do, of which there may be thousands in a second.
+const EventKinds& usualEventKinds();
+
+/// Reads "kinds=session,transfer". Or the parameter that is wrong.
+std::variant<EventKinds, FieldError> parseEventKinds(const std::string& query);
+
+/// The kinds that a good query asks for.
+EventKinds kindsIn(const std::string& query);
+
+/// Delivers each event to everybody who reads events of its kind. Thread-safe.
 class EventHub {
 public:
     /// The hub does not keep the reader alive, who showed this token, or none.
-    void add(const std::shared_ptr<EventReader>& reader, const std::string& tokenId = "");
+    void add(const std::shared_ptr<EventReader>& reader, const std::string& tokenId = "",
+             EventKinds kinds = usualEventKinds());
 
     /// Ends the streams of those who showed this token.
     void endThoseOf(const std::string& tokenId);
@@ -28,8 +44,11 @@ public:
     /// How many are reading.
     std::size_t readers();
 
-    /// Sends {event: type, data: data} to all readers. Does not block.
-    void publish(const std::string& type, const Json::Value& data);
+    /// Whether anybody reads events of this kind.
+    bool isWanted(const std::string& kind);
+
+    /// Sends {event: kind, data: data} to all who read events of this kind. Does not block.
+    void publish(const std::string& kind, const Json::Value& data);
 
 private:
     void forgetThoseThatLeft();
@@ -38,6 +57,7 @@ private:
     struct Entry {
         std::weak_ptr<EventReader> reader;
         std::string tokenId;
+        EventKinds kinds;
     };
     std::vector<Entry> readers_;
 };

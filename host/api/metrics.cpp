@@ -8,6 +8,7 @@
 #include <prometheus/registry.h>
 #include <prometheus/text_serializer.h>
 
+#include <array>
 #include <map>
 #include <mutex>
 
@@ -17,6 +18,26 @@ namespace {
 
 // Reads take milliseconds; a change restarts daemons, which takes seconds.
 const prometheus::Histogram::BucketBoundaries durations{0.001, 0.003, 0.01, 0.03, 0.1, 0.3, 1, 3, 10, 30};
+
+constexpr std::array<SessionProtocol, 3> protocols{SessionProtocol::ftp, SessionProtocol::ftps,
+                                                   SessionProtocol::sftp};
+/// All that the platform counts, so that each is there from the start, as 0.
+constexpr std::array<const char*, 6> loginOutcomes{"accepted", "password", "configuration",
+                                                   "banned",   "limit",    "other"};
+
+/// What the map has at the key; 0 where it has nothing.
+template<class Map> typename Map::mapped_type valueAt(const Map& map, const typename Map::key_type& key) {
+    const auto found = map.find(key);
+    return found == map.end() ? typename Map::mapped_type{} : found->second;
+}
+
+/// A total that is counted elsewhere. It never becomes less.
+void raise(prometheus::Counter& counter, std::uint64_t total) {
+    const double more = static_cast<double>(total) - counter.Value();
+    if (more > 0) {
+        counter.Increment(more);
+    }
+}
 
 std::map<std::string, std::string> labelsOf(const Row& row, const Outcome& outcome) {
     std::string result = outcome.takenBack ? "taken_back" : "success";
@@ -56,6 +77,11 @@ struct Metrics::Families {
     Counters restarts = counter("velt_daemon_restarts_total", "Restarts of a daemon that ended by itself");
     Gauges findings = gauge("velt_health_findings", "What /api/health finds wrong");
     prometheus::Gauge& eventReaders = gauge("velt_event_readers", "Open streams of events").Add({});
+    Gauges sessions = gauge("velt_sessions", "Sessions that are open");
+    Counters octets = counter("velt_transfer_octets_total", "Octets moved by uploads and downloads");
+    Counters logins = counter("velt_logins_total", "Logins, by what became of them");
+    prometheus::Counter& lost =
+        counter("velt_records_lost_total", "Records of what sessions did that could not be written").Add({});
     std::mutex mutex;
     std::map<std::string, std::uint64_t> seenRestarts;
     std::map<std::map<std::string, std::string>, double> seenFindings; ///< by their labels
@@ -110,6 +136,23 @@ void Metrics::setFindings(const Findings& findings) {
     }
 }
 
+void Metrics::setActivity(const ActivityTotals& totals, std::uint64_t lost) {
+    const std::lock_guard lock(families_->mutex);
+    for (const SessionProtocol protocol : protocols) {
+        const std::string name(protocolName(protocol));
+        families_->sessions.Add({{"protocol", name}})
+            .Set(static_cast<double>(valueAt(totals.sessions, protocol)));
+        const MovedOctets octets = valueAt(totals.octets, protocol);
+        raise(families_->octets.Add({{"protocol", name}, {"direction", "upload"}}), octets.in);
+        raise(families_->octets.Add({{"protocol", name}, {"direction", "download"}}), octets.out);
+        for (const char* const outcome : loginOutcomes) {
+            raise(families_->logins.Add({{"protocol", name}, {"outcome", outcome}}),
+                  valueAt(totals.logins, {protocol, outcome}));
+        }
+    }
+    raise(families_->lost, lost);
+}
+
 std::string Metrics::text() const {
     return prometheus::TextSerializer().Serialize(families_->registry.Collect());
 }
@@ -123,6 +166,7 @@ Route metricsRoute(Metrics& metrics, const ModuleTable& table, EventHub& events,
                     metrics.setDaemonRestarts(daemon, count);
                 }
                 metrics.setEventReaders(events.readers());
+                metrics.setActivity(activityTotals(), lostRecords());
                 if (const auto judgement = health.latest()) {
                     metrics.setFindings(*judgement);
                 }

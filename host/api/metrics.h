@@ -1,4 +1,5 @@
-// /metrics: requests and their durations by row and outcome, services up, daemon starts and restarts, health.
+// /metrics: requests and their durations by row and outcome, services up, daemon starts and restarts, health,
+// what users do.
 #ifndef VELT_HOST_API_METRICS_H
 #define VELT_HOST_API_METRICS_H
 
@@ -41,6 +42,9 @@ public:
 
     /// Counts what was found by identifier and severity; what is not found any more has a count of 0.
     void setFindings(const Findings& findings);
+
+    /// `lost` records could not be written since the machine began.
+    void setActivity(const ActivityTotals& totals, std::uint64_t lost);
 
     /// The text format of Prometheus.
     std::string text() const;

@@ -25,8 +25,11 @@ struct Route {
     std::vector<std::string> path; ///< its segments; "*" stands for any one
     bool adminOnly;
     RequestOrder::Kind kind;
-    std::function<HttpResponse(const Call&)> answer; ///< empty: the server makes it a stream of events
+    std::function<HttpResponse(const Call&)> answer;
     bool takesLists = false; ///< so that an admin's body may be as large as the server allows
+    /// Whether the server makes a stream of events of a request with this query, instead of asking for an
+    /// answer; empty: never.
+    std::function<bool(const std::string& query)> isStream{};
 };
 
 } // namespace velt::host

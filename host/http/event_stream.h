@@ -22,18 +22,18 @@ public:
         : session_(std::move(session)), strand_(session_->lane_.context.get_executor()),
           heartbeat_(session_->lane_.context) {}
 
-    static void start(const std::shared_ptr<Session<Stream>>& session) {
+    static void start(const std::shared_ptr<Session<Stream>>& session, HttpRequest request) {
         const auto stream = std::make_shared<EventStream>(session);
         session->enterWithoutDeadline(Connection::State::events);
         // What a slow reader has not taken waits here, where it is counted, and not in the kernel.
         const int size = 16 * 1024;
         setsockopt(session->descriptor(), SOL_SOCKET, SO_SNDBUF, &size, sizeof size);
-        boost::asio::post(stream->strand_, [stream] {
+        boost::asio::post(stream->strand_, [stream, asked = std::move(request)] {
             stream->push(std::make_shared<const std::string>(eventStreamHead()));
             stream->waitForEnd();
             stream->beat();
             // After the head, so that it is sent before any event.
-            stream->session_->handler_.addEventReader(stream, stream->session_->principal_);
+            stream->session_->handler_.addEventReader(stream, asked, stream->session_->principal_);
         });
     }
 

@@ -40,6 +40,7 @@ struct HttpRequest {
     std::string fetchSite;     ///< "" when there is none
     std::string authorization; ///< "" when there is none
     std::string ifMatch;       ///< "" when there is none
+    std::string accept;        ///< "" when there is none
     std::string body;
     bool wellFormed = true; ///< if false, the server refuses it once access is granted
 
@@ -123,7 +124,9 @@ public:
     /// The answer to what the server refuses by itself: a malformed or oversized request, an overload.
     virtual HttpResponse failure(int status, const std::string& detail) = 0;
 
-    virtual void addEventReader(const std::shared_ptr<EventReader>& reader, const Principal& principal) = 0;
+    /// The request that asked for the stream of events has its reader now.
+    virtual void addEventReader(const std::shared_ptr<EventReader>& reader, const HttpRequest& request,
+                                const Principal& principal) = 0;
 };
 
 } // namespace velt::host

@@ -192,6 +192,7 @@ void RequestReader::fillRequest() {
     const bool one = message.count(http::field::authorization) <= 1;
     request_.authorization = one ? text(message[http::field::authorization]) : "ambiguous";
     request_.ifMatch = text(message[http::field::if_match]);
+    request_.accept = text(message[http::field::accept]);
     request_.wellFormed = refusal_.detail.empty();
     keepAlive_ = request_.wellFormed && message.keep_alive();
     // A client that has begun the body does not wait.

@@ -20,7 +20,8 @@ struct HttpLimits {
     std::size_t connectionsOfOne = 250; ///< with the same token or user
     std::size_t eventStreamsOfOne = 32;
     std::size_t delayedRefusals = 100; ///< waiting at one time; further failed attempts are answered at once
-    std::size_t queuedEvents = std::size_t{256} * 1024; ///< bytes that a slow reader of events may lag behind
+    std::size_t queuedEvents =
+        std::size_t{1024} * 1024; ///< bytes that a slow reader of events may lag behind
     std::chrono::milliseconds headTime{10'000};
     std::chrono::milliseconds bodyTime{30'000};
     std::chrono::milliseconds idleTime{30'000};

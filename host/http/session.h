@@ -209,7 +209,7 @@ private:
         enterWithoutDeadline(State::working);
         HttpRequest request = reader_.takeRequest();
         if (handler_.asksForEvents(request)) {
-            serveEvents();
+            serveEvents(std::move(request));
             return;
         }
         withBody_ = request.method != "HEAD";
@@ -221,14 +221,14 @@ private:
                         });
     }
 
-    void serveEvents() {
+    void serveEvents(HttpRequest request) {
         eventStreamPlace_ = shared_.eventStreamPlaces.take(principal_.holder);
         if (eventStreamPlace_ == nullptr) {
             respond(handler_.failure(429, "Too many streams of events are open with this token or user."),
                     reader_.keepAlive());
             return;
         }
-        EventStream<Stream>::start(this->shared_from_this());
+        EventStream<Stream>::start(this->shared_from_this(), std::move(request));
     }
 
     void respond(const HttpResponse& response, bool keepAlive) {

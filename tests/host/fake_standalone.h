@@ -52,7 +52,19 @@ struct FakeStandalone {
     bool bansFail = false;                 ///< with `sentence`
     std::vector<std::string> failedLogins; ///< "SERVICE ADDRESS"
     std::function<void()> whileNoted;      ///< called for each of them before
-    std::string actor;                     ///< of the last request
+    std::string accessReport;              ///< unless `error` is set
+    std::string askedAccess;               ///< "USER PATH", the last one
+    std::vector<velt::OpenSession> openSessions;
+    bool sessionsFail = false;                     ///< they cannot be listed: with `sentence`
+    std::vector<std::string> immortal;             ///< the ids of those that cannot be ended: with `sentence`
+    std::vector<std::string> endedSessions;        ///< "ID BY REASON"
+    std::vector<velt::OperationRecord> operations; ///< newest first
+    velt::OperationFilter askedOperations;         ///< the last one
+    velt::ActivitySubscriber activitySubscriber;
+    velt::ActivityTotals activity;
+    std::uint64_t lostRecords = 0;
+    bool operationsFail = false; ///< with `sentence`
+    std::string actor;           ///< of the last request
     std::string address;
 
     static FakeStandalone& instance();

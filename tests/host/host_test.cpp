@@ -33,6 +33,8 @@ void HostTest::start() {
     for (const auto& module : modules) {
         table->load(module);
     }
+    const bool isFirst =
+        !std::filesystem::exists(settings.tokenFile); // else the tokens of the former start hold
     app = std::make_unique<velt::host::App>(settings, *table, log_);
     server = std::make_unique<velt::host::HttpServer>(*app, limits, tls);
     Listener tcp = Listener::tcp("127.0.0.1:0", false);
@@ -41,8 +43,10 @@ void HostTest::start() {
     server->add(Listener::unixSocket(socketPath, settings.access.adminGroup));
     app->begin();
     server->start(2);
-    admin = "Authorization: Bearer " + makeToken("admin") + "\r\n";
-    viewer = "Authorization: Bearer " + makeToken("viewer") + "\r\n";
+    if (isFirst) {
+        admin = "Authorization: Bearer " + makeToken("admin") + "\r\n";
+        viewer = "Authorization: Bearer " + makeToken("viewer") + "\r\n";
+    }
     FakeStandalone::instance().audit.clear(); // of the tokens
 }
 

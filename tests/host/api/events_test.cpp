@@ -28,9 +28,9 @@ protected:
     }
 
     /// A connection on which the stream of events has begun.
-    Client listen() const {
+    Client listen(const std::string& query = "") const {
         Client client = connect();
-        client.send(requestText("GET", "/events", admin));
+        client.send(requestText("GET", "/events" + query, admin));
         EXPECT_NE(client.readUntil(": connected\n\n"), "");
         // The server adds the reader right after that.
         std::this_thread::sleep_for(milliseconds(100));
@@ -120,9 +120,37 @@ TEST(Events, ReadersThatLeaveBeforeAnyEventAreForgotten) {
     hub.add(next);
     EXPECT_EQ(leaves.use_count(), 0);
     EXPECT_EQ(hub.readers(), 2U);
-    hub.publish("type", Json::Value(7));
-    EXPECT_EQ(stays->last, "event: type\ndata: 7\n\n");
+    hub.publish("log", Json::Value(7));
+    EXPECT_EQ(stays->last, "event: log\ndata: 7\n\n");
     EXPECT_EQ(next->last, stays->last);
+}
+
+TEST_F(HostEvents, AStreamHasTheKindsThatWereAskedFor) {
+    start();
+    Client all = listen();
+    Client bans = listen("?kinds=ban");
+    Client some = listen("?kinds=ban%2Cservice");
+    access.announce("ftpd", "stop");
+    velt::SystemEvent ban;
+    ban.name = "velt.login.ban";
+    access.eventSubscriber(ban);
+    EXPECT_EQ(all.readUntil("\n\n").find("event: service"), 0U);
+    EXPECT_EQ(all.readUntil("\n\n").find("event: ban"), 0U);
+    EXPECT_EQ(bans.readUntil("\n\n").find("event: ban"), 0U);
+    EXPECT_EQ(some.readUntil("\n\n").find("event: service"), 0U);
+    EXPECT_EQ(some.readUntil("\n\n").find("event: ban"), 0U);
+}
+
+TEST_F(HostEvents, AKindThatThereIsNotIsRefused) {
+    start();
+    for (const auto& [query, field] :
+         {std::pair("kinds=", "kinds"), std::pair("kinds", "kinds"), std::pair("kinds=ban,Log", "kinds"),
+          std::pair("kinds=ban,,", "kinds"), std::pair("kinds=%ff", "kinds"), std::pair("kind=ban", "kind"),
+          std::pair("kinds=ban&kinds=log", "kinds"), std::pair("kinds=ban&x=1", "x")}) {
+        const Answer answer = get(std::string("/events?") + query);
+        EXPECT_EQ(answer.status, 400) << query;
+        EXPECT_EQ(answer.json()["errors"][0]["field"], field) << query;
+    }
 }
 
 TEST_F(HostEvents, StreamsOfEventsAreCounted) {

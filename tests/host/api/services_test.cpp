@@ -171,4 +171,42 @@ TEST_F(HostServices, MetricsCountRequestsByRowAndOutcome) {
     }
 }
 
+TEST_F(HostServices, TheStatusHasTheirSessions) {
+    access.activity.sessions = {{velt::SessionProtocol::ftps, 3}, {velt::SessionProtocol::sftp, 40}};
+    access.lostRecords = 7;
+    const Json::Value status = get("/api/status").json();
+    EXPECT_EQ(status["services"][0]["sessions"], 0);
+    EXPECT_EQ(status["services"][1]["sessions"], 3);
+    EXPECT_EQ(status["services"][2]["sessions"], 40);
+    EXPECT_EQ(status["lost_records"], 7);
+}
+
+TEST_F(HostServices, WhatUsersDoIsMeasured) {
+    using velt::SessionProtocol;
+    for (const char* const line : {"velt_sessions{protocol=\"ftp\"} 0", "velt_records_lost_total 0",
+                                   "velt_transfer_octets_total{direction=\"download\",protocol=\"ftp\"} 0",
+                                   "velt_logins_total{outcome=\"configuration\",protocol=\"sftp\"} 0"}) {
+        EXPECT_TRUE(measured(line)) << line << "\n" << get("/metrics").body;
+    }
+    access.activity.sessions = {{SessionProtocol::ftp, 2}};
+    access.activity.octets = {{SessionProtocol::sftp, {1000, 5}}};
+    access.activity.logins = {{{SessionProtocol::ftps, "password"}, 9},
+                              {{SessionProtocol::ftps, "anything else"}, 1}};
+    access.lostRecords = 4;
+    for (int i = 0; i < 2; ++i) {
+        for (const char* const line :
+             {"velt_sessions{protocol=\"ftp\"} 2", "velt_records_lost_total 4",
+              "velt_transfer_octets_total{direction=\"upload\",protocol=\"sftp\"} 1000",
+              "velt_transfer_octets_total{direction=\"download\",protocol=\"sftp\"} 5",
+              "velt_logins_total{outcome=\"password\",protocol=\"ftps\"} 9"}) {
+            EXPECT_TRUE(measured(line)) << line << "\n" << get("/metrics").body;
+        }
+    }
+    EXPECT_EQ(get("/metrics").body.find("anything"), std::string::npos) << "no label of others' making";
+    access.activity.sessions.clear();
+    access.lostRecords = 0;
+    EXPECT_TRUE(measured("velt_sessions{protocol=\"ftp\"} 0"));
+    EXPECT_TRUE(measured("velt_records_lost_total 4")) << "a counter never goes back";
+}
+
 } // namespace

@@ -26,7 +26,7 @@ public:
     bool asksForEvents(const HttpRequest& request) const override { return request.target == "/events"; }
     void handle(HttpRequest, const Principal&, Done done) override { done({}); }
     HttpResponse failure(int status, const std::string&) override { return {status, "", "", {}}; }
-    void addEventReader(const std::shared_ptr<EventReader>&, const Principal&) override {}
+    void addEventReader(const std::shared_ptr<EventReader>&, const HttpRequest&, const Principal&) override {}
 
     std::promise<void> held;
     std::promise<void> released;

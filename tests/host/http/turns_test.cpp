@@ -73,7 +73,8 @@ public:
     bool asksForEvents(const HttpRequest& request) const override { return request.target == "/events"; }
     void handle(HttpRequest, const Principal&, Done done) override { done({}); }
     HttpResponse failure(int status, const std::string&) override { return {status, "", "", {}}; }
-    void addEventReader(const std::shared_ptr<EventReader>& reader, const Principal&) override {
+    void addEventReader(const std::shared_ptr<EventReader>& reader, const HttpRequest&,
+                        const Principal&) override {
         readers.push_back(reader);
     }
 
