@@ -21,6 +21,14 @@ std::string pathOf(const ApiMethod& method) {
            percentEncode(method.method);
 }
 
+/// The path in "</api/transfers?before=1-2>; rel=\"next\""; "" for another text.
+std::string nextIn(const std::string& link) {
+    const auto end = link.find('>');
+    const bool isNext = link.starts_with('<') && end != std::string::npos &&
+                        link.find("rel=\"next\"", end) != std::string::npos;
+    return isNext ? link.substr(1, end - 1) : "";
+}
+
 } // namespace
 
 Json::Value ApiClient::exchange(const std::string& method, const std::string& path,
@@ -77,6 +85,14 @@ void ApiClient::changeWhatWasRead(const std::function<void()>& change) {
 
 Json::Value ApiClient::get(const std::string& path) {
     return exchange("GET", path, std::nullopt);
+}
+
+TextPage ApiClient::getText(const std::string& path) {
+    HttpAnswer answer = http_.send("GET", path, std::nullopt);
+    if (answer.status != 200) {
+        throw failureFrom(answer, server(), {"GET", path});
+    }
+    return {std::move(answer.body), nextIn(answer.link)};
 }
 
 Json::Value ApiClient::post(const std::string& path, const Json::Value& body) {

@@ -15,6 +15,12 @@ struct ApiMethod {
     std::string method;
 };
 
+/// An answer that is no JSON.
+struct TextPage {
+    std::string text;
+    std::string next; ///< the path of the page behind it, as the server names it; "" for none
+};
+
 inline constexpr const char* chrootApi = "VELT.Core.FileServ.FTP.ChrootUser";
 
 class ApiClient {
@@ -35,6 +41,7 @@ public:
 
     /// For the paths of the server that are not methods; `path` starts with a slash.
     Json::Value get(const std::string& path);
+    TextPage getText(const std::string& path);
     Json::Value post(const std::string& path, const Json::Value& body);
     Json::Value patch(const std::string& path, const Json::Value& body);
     Json::Value remove(const std::string& path);

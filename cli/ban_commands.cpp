@@ -28,7 +28,8 @@ void listBans(Context& context) {
     }
     table.write(context.console.out);
     if (!answer["bans"].empty() && !answer["firewall"].asBool()) {
-        context.console.err << "The firewall is off, so FTP and SFTP do not refuse these addresses.\n";
+        context.console.err
+            << "The firewall is off: FTP refuses these addresses' logins, and SFTP does not refuse them.\n";
     }
 }
 

@@ -20,6 +20,9 @@ struct Console {
     /// From this call on, an interruption by the user no longer ends the process: interrupted() reports it.
     std::function<void()> watchInterruptions;
     std::function<bool()> interrupted;
+
+    /// Whether `out` is shown on a terminal.
+    std::function<bool()> outputIsTerminal;
 };
 
 /// The text of the named file, or of the standard input for "-". Failure (usage) when it cannot be read.

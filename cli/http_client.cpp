@@ -66,6 +66,12 @@ int onProgress(void* context, curl_off_t, curl_off_t, curl_off_t, curl_off_t) no
     return transfer.stopped ? 1 : 0;
 }
 
+/// Of the answer; "" when it has none of this name.
+std::string headerOf(CURL* curl, const char* name) {
+    curl_header* header = nullptr;
+    return curl_easy_header(curl, name, 0, CURLH_HEADER, -1, &header) == CURLHE_OK ? header->value : "";
+}
+
 std::string hintFor(const ServerAddress& server, CURLcode code, long systemError) {
     if (code == CURLE_OPERATION_TIMEDOUT) {
         return "The request may still take effect: check 'veltctl status', or wait longer with --timeout.";
@@ -164,10 +170,8 @@ void HttpClient::perform(bool mayBeStopped) {
         throw noAnswer(server_, curl, code, handle_->reason);
     }
     curl_easy_getinfo(curl, CURLINFO_RESPONSE_CODE, &transfer.answer.status);
-    curl_header* etag = nullptr;
-    if (curl_easy_header(curl, "ETag", 0, CURLH_HEADER, -1, &etag) == CURLHE_OK) {
-        transfer.answer.etag = etag->value;
-    }
+    transfer.answer.etag = headerOf(curl, "ETag");
+    transfer.answer.link = headerOf(curl, "Link");
 }
 
 HttpAnswer HttpClient::send(const std::string& method, const std::string& path,

@@ -16,6 +16,7 @@ struct HttpAnswer {
     long status = 0;
     std::string body;
     std::string etag; ///< empty when the server names no state
+    std::string link; ///< the header Link, or empty
 };
 
 /// Not thread-safe.

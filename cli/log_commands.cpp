@@ -147,7 +147,7 @@ void followLog(Context& context, const LogOptions& options) {
     FollowedLog log(context, options);
     // The page is asked for only once the events come, so that it has what was written before them.
     followEvents(
-        context, [&log] { log.begin(); },
+        context, {"log"}, [&log] { log.begin(); },
         [&log](const std::string& event, const std::string& data) {
             log.take(event, data);
             return true;

@@ -1,5 +1,7 @@
 #include "cli/program.h"
 
+#include <unistd.h>
+
 #include <csignal>
 #include <cstdlib>
 #include <exception>
@@ -29,9 +31,13 @@ std::optional<std::string> environmentVariable(const std::string& name) {
 
 int main(int argc, char** argv) {
     try {
-        velt::cli::Console console{std::cin,           std::cout,
-                                   std::cerr,          environmentVariable,
-                                   watchInterruptions, [] { return wasInterrupted != 0; }};
+        velt::cli::Console console{std::cin,
+                                   std::cout,
+                                   std::cerr,
+                                   environmentVariable,
+                                   watchInterruptions,
+                                   [] { return wasInterrupted != 0; },
+                                   [] { return isatty(STDOUT_FILENO) == 1; }};
         const std::vector<std::string> words(argv + 1, argv + argc);
         return static_cast<int>(velt::cli::runProgram(words, console));
     } catch (const std::exception& exception) {

@@ -88,6 +88,9 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     addRestartCommand(app, chosen);
     addHistoryCommands(app, chosen);
     addDiffCommand(app, chosen);
+    addAccessCommand(app, chosen);
+    addSessionCommands(app, chosen);
+    addTransfersCommand(app, chosen);
     addBanCommands(app, chosen);
     addTokenCommands(app, chosen);
     addDocumentCommands(app, chosen);

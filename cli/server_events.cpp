@@ -45,7 +45,20 @@ void EventStream::takeLine(std::string_view line) {
     }
 }
 
-void followEvents(Context& context, const std::function<void()>& onOpen,
+namespace {
+
+std::string eventsPath(const std::vector<std::string>& kinds) {
+    std::string path = "/events";
+    for (const std::string& kind : kinds) {
+        path += (&kind == &kinds.front() ? "?kinds=" : ",") + kind;
+    }
+    return path;
+}
+
+} // namespace
+
+void followEvents(Context& context, const std::vector<std::string>& kinds,
+                  const std::function<void()>& onOpen,
                   const std::function<bool(const std::string& event, const std::string& data)>& onEvent) {
     bool open = false;
     bool done = false;
@@ -54,7 +67,7 @@ void followEvents(Context& context, const std::function<void()>& onOpen,
     });
     context.console.watchInterruptions();
     context.api.follow(
-        "/events",
+        eventsPath(kinds),
         [&](std::string_view piece) {
             if (!open) {
                 open = true;

@@ -7,6 +7,7 @@
 #include <functional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace velt::cli {
 
@@ -31,10 +32,11 @@ private:
     bool hasData_ = false;
 };
 
-/// Calls `onOpen` as soon as the server sends events, then `onEvent` for each, until that returns false, the
-/// user interrupts or the output cannot be written. Failure (access) when the server ends the stream before
-/// that.
-void followEvents(Context& context, const std::function<void()>& onOpen,
+/// Asks for events of these kinds, or with none for the usual ones. Calls `onOpen` as soon as the server
+/// sends events, then `onEvent` for each, until that returns false, the user interrupts or the output cannot
+/// be written. Failure (access) when the server ends the stream before that.
+void followEvents(Context& context, const std::vector<std::string>& kinds,
+                  const std::function<void()>& onOpen,
                   const std::function<bool(const std::string& event, const std::string& data)>& onEvent);
 
 } // namespace velt::cli

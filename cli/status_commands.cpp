@@ -1,6 +1,7 @@
 #include "base/json_value.h"
 #include "base/printable.h"
 #include "cli/command.h"
+#include "cli/event_text.h"
 #include "cli/failure.h"
 #include "cli/health_count.h"
 #include "cli/json_io.h"
@@ -81,24 +82,8 @@ void showStatus(Context& context) {
 
 struct EventOptions {
     int count = 0;                  ///< 0: no end
-    std::vector<std::string> kinds; ///< empty: all
+    std::vector<std::string> kinds; ///< empty: the usual ones
 };
-
-std::string describeEvent(const std::string& event, const Json::Value& data) {
-    if (event == "service") {
-        return textAt(data, "service") + ": " + textAt(data, "action");
-    }
-    if (event == "log") {
-        const std::string actor = textAt(data, "actor");
-        return textAt(data, "event") + " " + textAt(data, "text") + (actor.empty() ? "" : " (" + actor + ")");
-    }
-    if (event == "change") {
-        const std::string id = textAt(data, "id");
-        return textAt(data, "way") + " by " + textAt(data, "actor") +
-               (id.empty() ? "" : " (change " + id + ")");
-    }
-    return displayValue(data);
-}
 
 void writeEvent(Context& context, const std::string& event, const std::string& text) {
     const Json::Value data = parseJson(text).valueOr(text);
@@ -114,7 +99,7 @@ void writeEvent(Context& context, const std::string& event, const std::string& t
 void showEvents(Context& context, const EventOptions& options) {
     int seen = 0;
     followEvents(
-        context, [] {},
+        context, options.kinds, [] {},
         [&](const std::string& event, const std::string& data) {
             const auto& kinds = options.kinds;
             if (kinds.empty() || std::ranges::find(kinds, event) != kinds.end()) {
@@ -139,8 +124,9 @@ void addStatusCommands(CLI::App& app, Command& chosen) {
         ->type_name("N");
     events
         ->add_option("--kind", options->kinds,
-                     "Only events of these kinds, separated by commas: service, log, ban, change")
-        ->check(CLI::IsMember({"service", "log", "ban", "change"}))
+                     "Only events of these kinds, separated by commas: service, log, ban, change (these four "
+                     "unless given), session, transfer, operation")
+        ->check(CLI::IsMember({"service", "log", "ban", "change", "session", "transfer", "operation"}))
         ->delimiter(',')
         ->allow_extra_args(false)
         ->type_name("KIND");

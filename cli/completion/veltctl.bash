@@ -5,7 +5,7 @@ _veltctl_words() {
     local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
         enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
     case $1 in
-        '') echo 'status doctor restart log events ftp security sftp shares chroot history diff undo confirm bans tokens export import call' ;;
+        '') echo 'status doctor restart log events ftp security sftp shares chroot history diff undo confirm access sessions kick transfers bans tokens export import call' ;;
         ftp | security | sftp) echo 'get set' ;;
         'ftp set') echo "$ftp utf8_mode=" ;;
         'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
@@ -27,6 +27,9 @@ _veltctl_options() {
         '') echo '--version' ;;
         log) echo '--since --event --actor --before --limit --all --follow' ;;
         events) echo '--count --kind' ;;
+        sessions) echo '--user --address --protocol --watch' ;;
+        kick) echo '--user --address --reason --dry-run' ;;
+        transfers) echo '--user --session --share --path --operation --result --from --until --before --limit --all --csv' ;;
         'ftp get') echo '--api-version' ;;
         'ftp set' | 'security set' | 'sftp set' | 'chroot users add' | 'chroot users delete' | 'chroot rules save' | \
             'chroot rules add' | 'chroot rules remove' | undo | import)
@@ -45,7 +48,9 @@ _veltctl_options() {
 _veltctl_takes_word() {
     case $1 in
         --url | --socket | --token-file | --ca-file | --timeout | --since | --event | --actor | --before | --limit | \
-            --count | --kind | --api-version | --offset | --type | --domain | --filter | --role | --output | --confirm-within | -o) return 0 ;;
+            --count | --kind | --api-version | --offset | --type | --domain | --filter | --role | --output | --confirm-within | \
+            --user | --address | --protocol | --reason | --session | --share | --path | --operation | --result | --from | --until | \
+            -o) return 0 ;;
     esac
     return 1
 }
@@ -54,7 +59,12 @@ _veltctl_takes_word() {
 _veltctl_option_value() {
     case $1 in
         --type) COMPREPLY=($(compgen -W 'local domain ldap all' -- "$2")) ;;
-        --kind) COMPREPLY=($(compgen -W 'service log ban change' -- "$2")) ;;
+        --kind) COMPREPLY=($(compgen -W 'service log ban change session transfer operation' -- "$2")) ;;
+        --protocol) COMPREPLY=($(compgen -W 'ftp ftps sftp' -- "$2")) ;;
+        --operation)
+            COMPREPLY=($(compgen -W 'upload download delete rename make-folder remove-folder mode owner times link truncate
+                session-opened session-closed login-refused' -- "$2")) ;;
+        --result) COMPREPLY=($(compgen -W 'done incomplete refused' -- "$2")) ;;
         --role) COMPREPLY=($(compgen -W 'admin viewer' -- "$2")) ;;
         --api-version) COMPREPLY=($(compgen -W '1 2 3' -- "$2")) ;;
         --socket | --token-file | --ca-file | --output | -o) _veltctl_files "$2" ;;

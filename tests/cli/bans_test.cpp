@@ -21,7 +21,7 @@ TEST_F(BansTest, BansThatNobodyEnforcesAreListedAsSuch) {
         return run({"bans", "list"}).err;
     };
     EXPECT_EQ(answer(R"({"address": "192.0.2.1", "service": "ftp", "failures": 3, "until": "x"})"),
-              "The firewall is off, so FTP and SFTP do not refuse these addresses.\n");
+              "The firewall is off: FTP refuses these addresses' logins, and SFTP does not refuse them.\n");
     EXPECT_EQ(answer(""), "");
 }
 

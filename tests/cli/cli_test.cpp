@@ -30,8 +30,9 @@ RunResult CliTest::run(const Words& words, const std::string& input) {
                                [] {},
                                [this] {
                                    ++interruptionsAsked;
-                                   return interrupted;
-                               }};
+                                   return interrupted || (interrupt > 0 && interruptionsAsked >= interrupt);
+                               },
+                               [this] { return outputIsTerminal; }};
     const int code = static_cast<int>(velt::cli::runProgram(words, console));
     return {code, out.str(), err.str()};
 }

@@ -54,6 +54,8 @@ protected:
     std::map<std::string, std::string> environment{{"VELT_SOCKET", server.socketPath()}};
     int interruptionsAsked = 0;
     bool interrupted = false;
+    int interrupt = 0; ///< the user interrupts before it is asked so often; 0: does not
+    bool outputIsTerminal = false;
 };
 
 /// Every command as its words ("chroot rules add"), with its options ("--json").

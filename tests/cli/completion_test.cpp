@@ -116,6 +116,11 @@ TEST(CompletionTest, ValuesOfOptionsAreOffered) {
     EXPECT_EQ(offered({"tokens", "create", "--role", ""}), (Words{"admin", "viewer"}));
     EXPECT_EQ(offered({"tokens", "create", "x", "--role", "=", "a"}), Words{"admin"});
     EXPECT_EQ(offered({"chroot", "users", "list", "--type", "l"}), (Words{"ldap", "local"}));
+    EXPECT_EQ(offered({"sessions", "--protocol", "f"}), (Words{"ftp", "ftps"}));
+    EXPECT_EQ(offered({"transfers", "--operation", "re"}), (Words{"remove-folder", "rename"}));
+    EXPECT_EQ(offered({"transfers", "--result", "=", "d"}), Words{"done"});
+    EXPECT_EQ(offered({"events", "--kind", "t"}), Words{"transfer"});
+    EXPECT_EQ(offered({"kick", "--user", ""}), Words{});
     EXPECT_EQ(offered({"log", "--actor", ""}), Words{});
     EXPECT_EQ(offered({"chroot", "rules", "add", ""}), (Words{"group", "user"}));
 }

@@ -22,8 +22,8 @@ constexpr const char* stream =
 
 class EventsTest : public CliTest {
 protected:
-    void answer(bool holdOpen) {
-        host.answerWith("GET /events", HttpReply{200, stream, "text/event-stream", holdOpen, false});
+    void answer(bool holdOpen, const std::string& query = "") {
+        host.answerWith("GET /events" + query, HttpReply{200, stream, "text/event-stream", holdOpen, false});
     }
 };
 
@@ -95,7 +95,8 @@ TEST_F(EventsTest, EachKindIsDescribedOnOneLine) {
 }
 
 TEST_F(EventsTest, OneKindIsShownAlone) {
-    answer(true);
+    answer(true, "?kinds=log");
+    answer(true, "?kinds=log,change");
     RunResult result = run({"events", "--count", "1", "--kind", "log"});
     EXPECT_EQ(result.code, 0) << result.err;
     EXPECT_NE(result.out.find("  log  0x11B00002"), std::string::npos) << result.out;
@@ -103,6 +104,29 @@ TEST_F(EventsTest, OneKindIsShownAlone) {
     result = run({"events", "--count", "2", "--kind", "log,change"});
     EXPECT_NE(result.out.find("  change  "), std::string::npos) << result.out;
     EXPECT_EQ(run({"events", "--kind", "other"}).code, 2);
+}
+
+TEST_F(EventsTest, WhatUsersDoIsDescribed) {
+    host.answerWith(
+        "GET /events?kinds=session,transfer,operation",
+        HttpReply{200,
+                  "event: session\ndata: {\"action\": \"refused\", \"user\": \"anna\", \"address\": "
+                  "\"192.0.2.1\", \"protocol\": \"sftp\", \"reason\": \"password\"}\n\n"
+                  "event: transfer\ndata: {\"action\": \"progress\", \"operation\": \"upload\", "
+                  "\"user\": \"anna\", \"address\": \"192.0.2.1\", \"protocol\": \"ftps\", \"path\": "
+                  "\"/a b\", \"octets\": 25000000, \"rate\": 1500}\n\n"
+                  "event: operation\ndata: {\"operation\": \"rename\", \"result\": \"done\", "
+                  "\"user\": \"anna\", \"address\": \"192.0.2.1\", \"protocol\": \"ftp\", \"path\": "
+                  "\"/a\", \"new_path\": \"/b\"}\n\n",
+                  "text/event-stream", true, false});
+    const RunResult result = run({"events", "--count", "3", "--kind", "session,transfer,operation"});
+    EXPECT_EQ(result.code, 0) << result.err;
+    for (const char* line :
+         {"Z  session  refused: anna from 192.0.2.1 by sftp (password)\n",
+          "Z  transfer  upload progress: /a b of anna from 192.0.2.1 by ftps, 25 MB, 1.5 KB/s\n",
+          "Z  operation  rename done: /a -> /b of anna from 192.0.2.1 by ftp\n"}) {
+        EXPECT_NE(result.out.find(line), std::string::npos) << line << "\n" << result.out;
+    }
 }
 
 TEST_F(EventsTest, ProgramsGetOneObjectPerLine) {

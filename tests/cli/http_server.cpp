@@ -147,6 +147,9 @@ void HttpServer::answer(int connection) {
     if (!reply.etag.empty()) {
         text += "ETag: " + reply.etag + "\r\n";
     }
+    if (!reply.link.empty()) {
+        text += "Link: " + reply.link + "\r\n";
+    }
     if (!reply.stream && reply.status != 204) {
         text += "Content-Length: " + std::to_string(reply.body.size()) + "\r\n";
     }

@@ -22,6 +22,7 @@ struct HttpReply {
     bool stream = false; ///< no length, and the connection stays open until the client or the server leaves
     bool drop = false;   ///< no answer at all
     std::string etag{};  ///< empty: no such header
+    std::string link{};  ///< the same
 };
 
 class HttpServer {

@@ -42,6 +42,7 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
     }
     std::sort(words.begin(), words.end());
     EXPECT_EQ(words, (Words{"",
+                            "access",
                             "bans",
                             "bans lift",
                             "bans list",
@@ -66,11 +67,13 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "ftp set",
                             "history",
                             "import",
+                            "kick",
                             "log",
                             "restart",
                             "security",
                             "security get",
                             "security set",
+                            "sessions",
                             "sftp",
                             "sftp get",
                             "sftp set",
@@ -80,6 +83,7 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "tokens create",
                             "tokens delete",
                             "tokens list",
+                            "transfers",
                             "undo"}));
 }
 
@@ -92,6 +96,7 @@ TEST_F(ProgramTest, WhatChangesSomethingHasADryRun) {
                                         "chroot rules load",
                                         "chroot users",
                                         "chroot users list",
+                                        "access",
                                         "diff",
                                         "doctor",
                                         "events",
@@ -102,12 +107,14 @@ TEST_F(ProgramTest, WhatChangesSomethingHasADryRun) {
                                         "log",
                                         "security",
                                         "security get",
+                                        "sessions",
                                         "sftp",
                                         "sftp get",
                                         "shares",
                                         "status",
                                         "tokens",
-                                        "tokens list"};
+                                        "tokens list",
+                                        "transfers"};
     for (const CommandDescription& command : describeCommands()) {
         EXPECT_EQ(std::ranges::count(command.options, "--dry-run"), readers.contains(command.words) ? 0 : 1)
             << command.words;

@@ -1,6 +1,7 @@
 #include "base/json_text.h"
 #include "cli/http_client.h"
 #include "cli/json_io.h"
+#include "cli/size_text.h"
 #include "cli/text_table.h"
 #include "cli/time_text.h"
 
@@ -50,6 +51,18 @@ TEST(TextTest, DurationsHaveTwoUnits) {
     EXPECT_EQ(durationText(63), "1 min 3 s");
     EXPECT_EQ(durationText(3600 * 5 + 60 * 10 + 1), "5 h 10 min");
     EXPECT_EQ(durationText(259200), "3 d 0 h");
+}
+
+TEST(TextTest, SizesHaveTwoDigits) {
+    EXPECT_EQ(sizeText(0), "0 B");
+    EXPECT_EQ(sizeText(999), "999 B");
+    EXPECT_EQ(sizeText(1000), "1.0 KB");
+    EXPECT_EQ(sizeText(1999), "1.9 KB");
+    EXPECT_EQ(sizeText(9'999'999), "9.9 MB");
+    EXPECT_EQ(sizeText(25'700'000), "25 MB");
+    EXPECT_EQ(sizeText(999'999'999), "999 MB");
+    EXPECT_EQ(sizeText(1'500'000'000'000), "1.5 TB");
+    EXPECT_EQ(sizeText(UINT64_MAX), "18 EB");
 }
 
 TEST(TextTest, ValuesAreShownForPeople) {
