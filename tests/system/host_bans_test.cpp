@@ -99,6 +99,21 @@ TEST_F(PasswordGuessing, overFtpShutsTheAddressOutOfBothServices) {
     EXPECT_NE(done({"log"}).find("The ban of " + guesser + " was lifted."), std::string::npos);
 }
 
+TEST_F(PasswordGuessing, endsOnConnectionsThatWereOpenBefore) {
+    done({"ftp", "set", "enable_ftp=on"});
+    FtpSession atWork(port, server, guesser);
+    ASSERT_EQ(atWork.logIn("alice"), 230);
+    FtpSession waiting(port, server, guesser);
+    FtpSession elsewhere(port, server, other);
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ(logIn(guesser, ftp, "alice", "wrong"), refused);
+    }
+    ASSERT_TRUE(becomesBanned(guesser + " ftp ")) << banned();
+    EXPECT_EQ(waiting.logIn("alice"), 530) << "the right password";
+    EXPECT_EQ(elsewhere.logIn("alice"), 230);
+    EXPECT_EQ(atWork.command("NOOP").code, 200) << "who has logged in goes on";
+}
+
 TEST_F(PasswordGuessing, overSftpShutsTheAddressOutWhateverTheName) {
     writeFile(worldRoot / "etc/velt/bans.conf", "version = 1\nfailures = 3\nban_seconds = 15\n");
     done({"sftp", "set", "enable=on"});

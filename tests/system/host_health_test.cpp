@@ -173,8 +173,8 @@ TEST_F(HostHealth, AProgramThatLoginsNeedAndThatCannotBeRunIsFound) {
     EXPECT_EQ(stopHost(), 0);
     programFolder = "/mnt/programs";
     fs::create_directories(programFolder);
-    for (const char* each :
-         {"velt-login-view", "velt-authorized-keys", "velt-supervise", "mod_velt_login.so"}) {
+    for (const char* each : {"velt-login-view", "velt-authorized-keys", "velt-supervise", "mod_velt_login.so",
+                             "velt-sftp-session.so"}) {
         fs::copy_file(fs::path(VELT_BUILT_FOLDER) / each, fs::path(programFolder) / each,
                       fs::copy_options::overwrite_existing);
     }

@@ -49,6 +49,7 @@ struct Place {
     const char* what;
     std::string path;
     std::string body;
+    const char* method = "POST";
 };
 
 const std::vector<Place> places{
@@ -72,6 +73,14 @@ const std::vector<Place> places{
      R"({"rules": [{"type": @, "name": "bob", "path": "/public"}]})"},
     {"name of a token", "/api/tokens", R"({"name": @, "role": "viewer"})"},
     {"role of a token", "/api/tokens", R"({"name": "x", "role": @})"},
+    {"external address in a patch", "/api/settings", R"({"ftp": {"use_ext_ip": true, "ext_ip": @}})",
+     "PATCH"},
+    {"share in a patch", "/api/settings", R"({"security": {"anonymous_chroot_share": @}})", "PATCH"},
+    {"rule in a patch", "/api/settings", R"({"chroot_rules": [{"type": "user", "name": @, "path": @}]})",
+     "PATCH"},
+    {"whole document", "/api/settings", R"({"ftp": {"ext_ip": @}, "sftp": @})", "PUT"},
+    {"name of a part", "/api/settings", R"({@: {"ext_ip": @}})", "PATCH"},
+    {"state to compare", "/api/diff", R"({"from": @, "to": "now"})"},
 };
 
 class HostInjection : public HostService {
@@ -128,7 +137,8 @@ TEST_F(HostInjection, noTextOfARequestIsMoreThanAText) {
         for (const Attempt& attempt : attempts()) {
             const testing::ScopedTrace trace(__FILE__, __LINE__,
                                              std::string(place.what) + ": " + attempt.what);
-            const HttpResult answer = curl(place.path, filled(place.body, attempt.json));
+            const HttpResult answer =
+                curl(place.path, filled(place.body, attempt.json), {"--request", place.method});
             EXPECT_TRUE(answer.status >= 200 && answer.status < 500 && answer.status != 408) << answer.status;
             if (attempt.what == std::string("bytes that are no UTF-8")) {
                 EXPECT_EQ(answer.status, 400) << answer.body;

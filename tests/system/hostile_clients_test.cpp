@@ -93,33 +93,41 @@ TEST_F(FtpService, whoIsLoggedInIsNobodyElsesBusiness) {
     ASSERT_NE(board, found.end());
     const std::vector<std::string> list = {"ftpwho", "-f", *board};
     EXPECT_TRUE(contains(runProcess(list).output, "alice")) << "root sees it";
+    const auto canRead = [](std::vector<std::string> rights, const std::string& path) {
+        rights.insert(rights.end(), {"cat", path});
+        return runProcess(rights).exitCode == 0;
+    };
+    const std::vector<std::string> others{"setpriv", "--reuid=1002", "--regid=1002", "--clear-groups"};
+    EXPECT_TRUE(canRead(others, "/etc/passwd")) << "they can read what is for all";
     for (const std::string& path : found) {
         if (std::filesystem::is_regular_file(path)) {
-            EXPECT_NE(runProcess({"setpriv", "--reuid=1002", "--regid=1002", "--clear-groups", "cat", path})
-                          .exitCode,
-                      0)
-                << path;
+            EXPECT_TRUE(canRead({"env"}, path)) << path;
+            EXPECT_FALSE(canRead(others, path)) << path;
         }
     }
 }
 
 TEST_F(FtpService, nobodyGetsSetUserIdFiles) {
-    addShare("drop", "drop", Access::write);
-    letAnonymousIn("drop");
+    const auto share = addShare("drop", "drop", Access::write);
+    storeRules({"u:1002:/drop"});
     start();
-    FtpSession alice(port);
-    ASSERT_EQ(alice.logIn("alice"), 230);
-    ASSERT_EQ(alice.send("STOR tool", "x"), 226);
-    EXPECT_EQ(alice.command("SITE CHMOD 755 tool").code, 200);
-    for (const std::string mode : {"4755", "2755", "6711", "u+s", "g+s", "ug+srx"}) {
-        EXPECT_EQ(alice.command("SITE CHMOD " + mode + " tool").code, 550) << mode;
+    const std::vector<std::pair<std::string, std::filesystem::path>> users{{"alice", "/mnt/home/alice/tool"},
+                                                                           {"bob", share / "tool"}};
+    for (const auto& [user, file] : users) {
+        FtpSession session(port);
+        ASSERT_EQ(session.logIn(user), 230);
+        ASSERT_EQ(session.send("STOR tool", "x"), 226);
+        EXPECT_EQ(session.command("SITE CHMOD 755 tool").code, 200);
+        for (const std::string mode : {"4755", "2755", "6711", "u+s", "g+s", "ug+srx"}) {
+            EXPECT_EQ(session.command("SITE CHMOD " + mode + " tool").code, 550) << mode;
+        }
+        for (const std::string mode : {"4755", "2755"}) {
+            EXPECT_EQ(session.command("MFF UNIX.mode=" + mode + "; tool").code, 501) << mode;
+        }
+        struct stat status {};
+        ASSERT_EQ(stat(file.c_str(), &status), 0) << file;
+        EXPECT_EQ(status.st_mode & 07777U, 0755U) << file;
     }
-    for (const std::string mode : {"4755", "2755"}) {
-        EXPECT_EQ(alice.command("MFF UNIX.mode=" + mode + "; tool").code, 501) << mode;
-    }
-    struct stat status {};
-    ASSERT_EQ(stat("/mnt/home/alice/tool", &status), 0);
-    EXPECT_EQ(status.st_mode & 07777U, 0755U);
 }
 
 TEST_F(FtpService, guestsChangeNoModes) {

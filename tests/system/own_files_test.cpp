@@ -123,15 +123,15 @@ TEST_F(OwnFiles, leaveTheRestOfTheHomeAlone) {
     start();
     FtpSession session(port);
     ASSERT_EQ(session.logIn("alice"), 230);
-    for (const std::string name : {"profile", ".sshx", ".vimrc", "ssh", ".profiles"}) {
+    for (const std::string name : {"profile", "sshx", ".letter.part", "ssh", "._letter"}) {
         EXPECT_EQ(session.send("STOR " + name, "x"), 226) << name;
         EXPECT_EQ(session.send("APPE " + name, "y"), 226) << name;
         EXPECT_EQ(contentsOf(home / name), "xy") << name;
         EXPECT_EQ(session.command("SITE CHMOD 600 " + name).code, 200) << name;
         EXPECT_EQ(modeOf(home / name), 0600U) << name;
         EXPECT_EQ(session.command("MFMT 20200101000000 " + name).code, 213) << name;
-        EXPECT_EQ(move(session, name, name + "2"), 250) << name;
-        EXPECT_EQ(session.command("DELE " + name + "2").code, 250) << name;
+        EXPECT_EQ(move(session, name, "2" + name), 250) << name;
+        EXPECT_EQ(session.command("DELE 2" + name).code, 250) << name;
     }
     ASSERT_EQ(session.command("MKD site").code, 257);
     EXPECT_EQ(session.send("STOR site/.profile", "x"), 226) << "only the home's own";
@@ -278,7 +278,7 @@ TEST_F(OwnFiles, includeTheSystemFoldersOfASessionsRoot) {
         }
         EXPECT_EQ(std::distance(fs::directory_iterator("/mnt/srv" + name), {}), 2);
         EXPECT_TRUE(
-            contains(DaemonProcess::output(), "The share " + name.substr(1) + " is read-only over FTP"))
+            contains(DaemonProcess::output(), "The share " + name.substr(1) + " is read-only in sessions"))
             << name;
     }
     EXPECT_EQ(session.send("STOR /usr/etc/new", "x"), 226);

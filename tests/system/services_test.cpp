@@ -11,6 +11,7 @@
 #include "tests/support/run_program.h"
 #include "tests/system/support/ftp_service.h"
 #include "tests/system/support/private_world.h"
+#include "tests/system/support/sftp_session.h"
 
 #include <gtest/gtest.h>
 
@@ -216,6 +217,29 @@ TEST_F(ControlledSftp, aTransferOutlivesAPauseAndAMove) {
     EXPECT_EQ(contentsOf("/mnt/control-got").size(), 300000U);
     EXPECT_NE(fetchSlowly(2222).exitCode, 0) << "the former port is closed";
     EXPECT_NE(VELTSFTPIsAlive(), 0);
+}
+
+TEST_F(ControlledSftp, followsWhatChangesOfFtpAndKeepsItsSessions) {
+    ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
+    SftpSession session(2222, "alice");
+    ASSERT_EQ(session.send("masked", "x", sftpWrite | sftpMake, 0666), sftpGood);
+    ASSERT_EQ(VELTFTPUmaskEnabledSet(false), 0) << lastErrorSentence();
+    SftpSession later(2222, "alice");
+    EXPECT_EQ(later.send("open", "x", sftpWrite | sftpMake, 0666), sftpGood);
+    EXPECT_EQ(session.send("former", "x", sftpWrite | sftpMake, 0666), sftpGood);
+    EXPECT_EQ(modeOf("/mnt/home/alice/masked"), 0644U);
+    EXPECT_EQ(modeOf("/mnt/home/alice/open"), 0666U);
+    EXPECT_EQ(modeOf("/mnt/home/alice/former"), 0644U) << "it keeps what it began with";
+    const ProcessId listener = serviceState("sftp").daemon;
+    ASSERT_EQ(VELTFTPFIPSEnabledSet(1), 0) << lastErrorSentence();
+    EXPECT_NE(serviceState("sftp").daemon, listener);
+    EXPECT_NE(fetchSlowly(2222).exitCode, 0) << "an Ed25519 key is none of the approved ones";
+    EXPECT_TRUE(SftpSession(2222, "alice").isOpen()) << "a password with approved algorithms";
+    EXPECT_EQ(session.receive("masked"), "x");
+    ASSERT_EQ(VELTFTPFIPSEnabledSet(1), 0) << lastErrorSentence();
+    ASSERT_EQ(VLIBServiceStop("sftp", 0), 0) << lastErrorSentence();
+    ASSERT_EQ(VELTFTPFIPSEnabledSet(0), 0) << lastErrorSentence();
+    EXPECT_EQ(VELTSFTPIsAlive(), 0) << "what does not run is not started";
 }
 
 TEST_F(ControlledSftp, aRefusedMoveLeavesADaemonThatComesBackAsItWas) {

@@ -130,6 +130,15 @@ TEST_F(SftpService, givesNoShellAndForwardsNothing) {
     const auto tunnel = runProcess(forward, {}, std::chrono::seconds(20));
     EXPECT_NE(tunnel.exitCode, 0);
     EXPECT_EQ(tunnel.output.find("SSH-2.0"), std::string::npos) << tunnel.output;
+
+    for (const std::string& from : {std::to_string(port + 1), std::string("/mnt/home/alice/forwarded")}) {
+        auto back = client("ssh", port);
+        back.insert(back.end(), {"-N", "-o", "ExitOnForwardFailure=yes", "-R",
+                                 from + ":127.0.0.1:" + std::to_string(port), "alice@127.0.0.1"});
+        const auto listening = runProcess(back, {}, std::chrono::seconds(20));
+        EXPECT_EQ(listening.exitCode, 255) << "ssh ends by itself, since it was refused";
+        EXPECT_NE(listening.errors.find("forwarding failed"), std::string::npos) << listening.errors;
+    }
 }
 
 TEST_F(SftpService, aKeyThatIsRestrictedToACommandOpensNothing) {

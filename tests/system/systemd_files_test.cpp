@@ -1,6 +1,7 @@
 // The files of a server at work, and the table in docs/security.md.
 #include "standalone/core/state_root.h"
 #include "tests/support/files.h"
+#include "tests/system/support/systemd_host.h"
 #include "tests/system/support/systemd_services.h"
 
 #include <fnmatch.h>
@@ -109,6 +110,18 @@ curl -sS ftp://127.0.0.1/)"},
         for (const Row& row : rows) {
             EXPECT_TRUE(row.found) << "in the table, but not on the server: " << row.pattern;
         }
+    });
+}
+
+// Where nearly all is read-only for the host, it has to ask elsewhere what users may write.
+TEST_F(UnderSystemd, whatUsersMayDoIsToldAsTheServicesSeeIt) {
+    inside([] {
+        startHost();
+        const std::string share = done({"access", "alice", "/srv/public"});
+        EXPECT_TRUE(
+            share.starts_with("FTP: read and write, as /public. alice may read and change /srv/public"))
+            << share;
+        EXPECT_EQ(shell("systemctl list-units --all --plain --no-legend 'run-*'"), "") << "nothing is left";
     });
 }
 

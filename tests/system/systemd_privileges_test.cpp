@@ -1,10 +1,12 @@
 // What veltd and the services do, with the little that their units leave them.
 #include "base/unique_fd.h"
 #include "standalone/core/state_root.h"
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/shares/folder_access.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/support/waiting.h"
+#include "tests/system/support/systemd_host.h"
 #include "tests/system/support/systemd_services.h"
 
 #include <grp.h>
@@ -32,51 +34,6 @@ namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
 using std::chrono::seconds;
-
-/// What veltctl writes; a failure of it fails the test.
-std::string done(const std::vector<std::string>& words, const std::string& input = {}) {
-    std::vector<std::string> arguments{"/usr/local/bin/veltctl"};
-    arguments.insert(arguments.end(), words.begin(), words.end());
-    const ProcessResult result = runProcess(arguments, input, seconds(30));
-    EXPECT_EQ(result.exitCode, 0) << ::testing::PrintToString(words) << result.output << result.errors;
-    return result.output;
-}
-
-std::string refused(const std::vector<std::string>& words) {
-    std::vector<std::string> arguments{"/usr/local/bin/veltctl"};
-    arguments.insert(arguments.end(), words.begin(), words.end());
-    const ProcessResult result = runProcess(arguments, {}, seconds(30));
-    EXPECT_NE(result.exitCode, 0) << ::testing::PrintToString(words) << result.output;
-    return result.errors;
-}
-
-std::string shell(const std::string& commands) {
-    const ProcessResult result = runProcess({"sh", "-c", commands}, {}, seconds(30));
-    return result.output + result.errors;
-}
-
-/// The machine with all installed, its host at work, and a firewall of ours that drops.
-void startHost() {
-    setStateRoot("/");
-    fs::create_directories("/etc/velt");
-    std::ofstream("/etc/velt/firewall.conf") << "version = 1\nmode = drop\nports = 2323\n";
-    fs::create_directories("/srv/public");
-    std::ofstream("/srv/public/about") << "public";
-    std::ofstream("/srv/public/large") << "large";
-    fs::resize_file("/srv/public/large", 64 << 20);
-    ASSERT_EQ(::chmod("/srv/public", 0777), 0);
-    fs::create_directories("/srv/private");
-    ASSERT_EQ(::chmod("/srv/private", 0700), 0);
-    std::ofstream("/etc/velt/shares.json") << R"({"version": 1, "shares": [
-        {"name": "public", "comment": "", "path": "/srv/public", "ftp": true,
-         "users": {"alice": "write", "ftp": "write"}, "groups": {}},
-        {"name": "private", "comment": "", "path": "/srv/private", "ftp": true,
-         "users": {"ftp": "write"}, "groups": {}}]})";
-    installAndEnableHost();
-    ASSERT_TRUE(hostAnswers());
-    letAliceInByKey();
-    std::ofstream("/home/alice/home-of") << "alice";
-}
 
 /// What the kernel says of a process: the value of a line of its status.
 std::string statusOf(const std::string& process, const std::string& name) {
@@ -146,13 +103,18 @@ TEST_F(UnderSystemd, theHostHasNoMoreRightsThanItNeeds) {
                                                     CAP_NET_BIND_SERVICE, CAP_NET_ADMIN, CAP_SYS_PTRACE}));
         EXPECT_EQ(statusOf(host, "NoNewPrivs"), "1");
         EXPECT_EQ(statusOf(host, "Seccomp"), "2");
+        const std::string within = "nsenter --mount --target " + host + " ";
+        const auto canMakeFileIn = [&](const std::string& folder) {
+            shell(within + "touch " + folder + "/made-by-veltd");
+            return fs::exists(folder + "/made-by-veltd");
+        };
+        EXPECT_TRUE(canMakeFileIn("/etc/velt"));
         for (const char* folder :
              {"/", "/usr", "/home", "/home/alice", "/srv", "/root", "/opt", "/var", "/boot"}) {
-            const std::string made = std::string(folder) + "/made-by-veltd";
-            shell("nsenter --mount --target " + host + " touch " + made);
-            EXPECT_FALSE(fs::exists(made)) << made;
+            EXPECT_FALSE(canMakeFileIn(folder)) << folder;
         }
-        EXPECT_EQ(shell("nsenter --mount --target " + host + " ls -A /tmp"), "");
+        std::ofstream("/tmp/of-others") << "seen by all but the host";
+        EXPECT_EQ(shell(within + "ls -A /tmp"), "");
     });
 }
 
@@ -186,9 +148,9 @@ TEST_F(UnderSystemd, systemdFindsLittleExposed) {
         done({"sftp", "set", "enable=on", "portnum=2222"});
         // The thresholds are tenths.
         const std::vector<std::pair<std::string, std::string>> units{
-            {"/usr/local/lib/systemd/system/veltd.service", "30"},
-            {"/run/systemd/system/velt-ftpd.service", "60"},
-            {"/run/systemd/system/velt-sftp.service", "60"}};
+            {"/usr/local/lib/systemd/system/veltd.service", "29"},
+            {"/run/systemd/system/velt-ftpd.service", "51"},
+            {"/run/systemd/system/velt-sftp.service", "51"}};
         for (const auto& [unit, threshold] : units) {
             const ProcessResult verdict = runProcess({"systemd-analyze", "security", "--no-pager",
                                                       "--offline=true", "--threshold=" + threshold, unit});
@@ -326,6 +288,7 @@ void endSupervisor(const std::string& service) {
 TEST_F(UnderSystemd, theHostEndsTheSftpSessionsOfASupervisorThatIsGone) {
     inside([] {
         startHost();
+        done({"security", "set", "user_chroot=on"});
         done({"sftp", "set", "enable=on", "portnum=2222"});
         SlowTransfer transfer(2222);
         endSupervisor("sftp");
@@ -384,9 +347,13 @@ TEST_F(UnderSystemd, sessionsWorkInHomesAndShares) {
         EXPECT_EQ(contentsOf("/home/alice/sent"), "alice");
         EXPECT_EQ(shell("curl -sS -T /home/alice/home-of ftp://127.0.0.1/by-guest"), "");
         EXPECT_EQ(contentsOf("/srv/public/by-guest"), "alice");
-        const ProcessResult sftp =
-            runSftp(2222, "put /root/key.pub /home/alice/by-sftp\nmkdir folder\nchmod 2770 folder\n");
-        EXPECT_EQ(sftp.exitCode, 0) << sftp.errors;
+        const ProcessResult inHome = runSftp(2222, "put /root/key.pub /by-sftp\n");
+        EXPECT_EQ(inHome.exitCode, 0) << inHome.errors;
+        EXPECT_EQ(shell("stat -c '%U' /home/alice/by-sftp"), "alice\n");
+        ASSERT_EQ(messageOf(storeConfinementSettings({.sftp = false})), "");
+        done({"restart", "sftp"});
+        const ProcessResult onServer = runSftp(2222, "mkdir folder\nchmod 2770 /home/alice/folder\n");
+        EXPECT_EQ(onServer.exitCode, 0) << onServer.errors;
         EXPECT_EQ(shell("stat -c '%U %a' /home/alice/folder"), "alice 2770\n");
     });
 }

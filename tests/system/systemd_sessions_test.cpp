@@ -21,6 +21,7 @@ using std::chrono::seconds;
 void startSftp() {
     openMachine();
     letAliceInByKey();
+    storeFtp(0, 2121, true);
     storeSftp(true);
     ASSERT_EQ(VLIBServiceStart("sftp", 0), 0) << lastErrorSentence();
     ASSERT_NE(VELTSFTPIsAlive(), 0);

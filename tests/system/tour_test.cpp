@@ -273,7 +273,9 @@ TEST_F(QuickStart, servesWhoeverBecameRootForTheStart) {
 TEST_F(QuickStart, saysWhenFtpCannotWork) {
     const std::vector<std::string> withoutMounts{"setpriv", "--bounding-set", "-sys_admin", "--inh-caps",
                                                  "-sys_admin"};
-    EXPECT_TRUE(contains(run(tree_, startBuilt, withoutMounts), "FTP will not start here: as root "));
+    const std::string first = run(tree_, startBuilt, withoutMounts);
+    EXPECT_TRUE(contains(first, "FTP will not start here: as root ")) << first;
+    EXPECT_TRUE(contains(first, "SFTP starts, and shows its users the whole\nserver.")) << first;
     const std::string use =
         run(tree_, ". var/env; veltctl sftp set enable=on; veltctl ftp set enable_ftp=on", withoutMounts);
     EXPECT_TRUE(contains(use, "cannot make a mount namespace")) << use;
@@ -287,8 +289,9 @@ TEST_F(QuickStart, worksWithoutRootsRights) {
     // Where carol can get to it, wherever the tests were built.
     const std::string built = "/mnt/built";
     fs::create_directory(built);
-    for (const char* program : {"veltd", "veltctl", "velt-supervise", "velt-login-view",
-                                "libvelt-standalone.so", "mod_velt_login.so", "VELT.Core.FileServ.FTP.so"}) {
+    for (const char* program :
+         {"veltd", "veltctl", "velt-supervise", "velt-login-view", "libvelt-standalone.so",
+          "mod_velt_login.so", "velt-sftp-session.so", "VELT.Core.FileServ.FTP.so"}) {
         fs::copy_file(fs::path(VELT_BUILT_FOLDER) / program, fs::path(built) / program);
     }
     const std::string startHere = "scripts/start --built " + built;

@@ -242,7 +242,7 @@ TEST_F(FtpService, fxpOnLetsDataGoElsewhere) {
 }
 
 TEST_F(FtpService, fxpOnLetsNoDataGoToTheInside) {
-    for (const char* own : {"198.51.100.7/32", "2001:db8::7/128"}) {
+    for (const char* own : {"198.51.100.7/32", "2001:db8::7/128", "192.0.2.1/28"}) {
         ASSERT_EQ(runProcess({"ip", "address", "replace", own, "dev", "lo"}).exitCode, 0);
     }
     ASSERT_EQ(VLIBCINFOSetKeyValue("ftp_ext_ip", "203.0.113.7"), 0) << lastErrorSentence();
@@ -253,13 +253,14 @@ TEST_F(FtpService, fxpOnLetsNoDataGoToTheInside) {
     ASSERT_EQ(session.logIn("alice"), 230);
     for (const char* address :
          {"127,0,0,2", "127,255,255,255", "0,0,0,1", "169,254,1,1", "224,0,0,1", "255,255,255,255",
-          "198,51,100,7", "203,0,113,7", "4294967423,0,0,2", "+127,0,0,2", "0127,0,0,2"}) {
+          "198,51,100,7", "203,0,113,7", "192,0,2,9", "4294967423,0,0,2", "+127,0,0,2", "0127,0,0,2"}) {
         EXPECT_EQ(session.command(std::string("PORT ") + address + ",200,1").code, 501) << address;
     }
     for (const char* address :
          {"|1|127.0.0.2|", "|1|169.254.1.1|", "|1|198.51.100.7|", "|2|::1|", "|2|::|", "|2|::ffff:127.0.0.2|",
           "|2|::ffff:7f00:2|", "|2|::127.0.0.2|", "|2|::ffff:198.51.100.7|", "|2|2001:db8::7|", "|2|fe80::1|",
-          "|2|ff02::1|", "!1!127.0.0.2!", "|01|127.0.0.2|"}) {
+          "|2|ff02::1|", "!1!127.0.0.2!", "|01|127.0.0.2|", "|2|64:ff9b::cb00:7107|", "|2|64:ff9b:1::7f00:1|",
+          "|1|192.0.2.9|"}) {
         EXPECT_EQ(session.command(std::string("EPRT ") + address + "51201|").code, 501) << address;
     }
     for (const char* command : {"PORT 127,0,0,1,200,1", "PORT 198,51,100,9,200,1", "EPRT |1|127.0.0.1|51201|",

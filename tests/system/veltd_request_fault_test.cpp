@@ -61,7 +61,8 @@ protected:
 
     static std::string tokens() {
         std::string names;
-        for (const Json::Value& token : ask("GET", "/api/tokens").json()["tokens"]) {
+        const Json::Value listed = ask("GET", "/api/tokens").json();
+        for (const Json::Value& token : listed["tokens"]) {
             names += token["name"].asString() + " ";
         }
         return names;
@@ -83,7 +84,8 @@ protected:
         if (settings() != old_) {
             ask("PATCH", "/api/settings", oldSettings);
         }
-        for (const Json::Value& token : ask("GET", "/api/tokens").json()["tokens"]) {
+        const Json::Value listed = ask("GET", "/api/tokens").json();
+        for (const Json::Value& token : listed["tokens"]) {
             if (token["name"] != "curl") {
                 ask("DELETE", "/api/tokens/" + token["id"].asString());
             }

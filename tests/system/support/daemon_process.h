@@ -25,8 +25,9 @@ public:
     void stop();
 
     pid_t pid() const { return pid_; }
+    bool runs() const { return pid_ > 0; }
 
-    /// What the last daemon has written to its outputs: its log.
+    /// What daemons have written to their outputs, their log, since the last one was started.
     static std::string output();
 
 private:

@@ -59,7 +59,8 @@ std::string readToEnd(int connection) {
     return data;
 }
 
-FtpSession::FtpSession(int port, const std::string& host) : connection_(connectTo(host, port)) {
+FtpSession::FtpSession(int port, const std::string& host, const std::string& from)
+    : connection_(connectTo(host, port, from)) {
     greeting_ = read();
 }
 

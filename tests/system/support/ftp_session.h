@@ -25,7 +25,7 @@ UniqueFd connectTo(const std::string& host, int port, const std::string& from = 
 
 class FtpSession {
 public:
-    explicit FtpSession(int port, const std::string& host = "127.0.0.1");
+    explicit FtpSession(int port, const std::string& host = "127.0.0.1", const std::string& from = {});
 
     const Reply& greeting() const { return greeting_; }
     Reply command(const std::string& line);

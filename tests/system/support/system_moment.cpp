@@ -29,8 +29,10 @@ std::map<std::string, std::string> filesOfState() {
     std::map<std::string, std::string> files;
     for (const auto& entry : fs::recursive_directory_iterator(worldRoot)) {
         const std::string name = fs::relative(entry.path(), worldRoot).string();
-        // A session leaves traces in its daemon's own files.
-        if (entry.is_regular_file() && !contains(name, "log.db") && !contains(name, "/daemon/")) {
+        // A session leaves traces in its daemon's own files, and in the records of what it did.
+        const bool isOfSessions = contains(name, "/daemon/") || contains(name, "run/velt/sessions") ||
+                                  contains(name, "lib/velt/transfers");
+        if (entry.is_regular_file() && !contains(name, "log.db") && !isOfSessions) {
             files[name] = contentsOf(entry.path());
         }
     }
