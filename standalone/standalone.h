@@ -38,6 +38,9 @@
 #include "standalone/activity/operation_search.h"
 #include "standalone/control/open_sessions.h"
 
+// The settings of the platform, which no module knows.
+#include "standalone/control/change_confinement.h"
+
 // The chroot rules that a module cannot name.
 #include "standalone/rules/unnamed_rules.h"
 

@@ -27,6 +27,7 @@ struct StoredFile {
 constexpr std::array storedFiles{
     StoredFile{paths::ftpSettings, "ftp settings"},
     StoredFile{paths::sftpSettings, "sftp settings"},
+    StoredFile{paths::confinementSettings, "confinement settings"},
     StoredFile{paths::chrootRules, "chroot rules"},
     StoredFile{paths::systemInformation, "system information"},
 };
@@ -56,8 +57,8 @@ Result<int> actOn(const Daemon& daemon, Effect effect, SessionPolicy policy, Res
 }
 
 bool endsSessions(const Daemon& daemon, const StagedRequest& request) {
-    const bool takesRights = &daemon == &ftpDaemon && request.takesFtpRights;
-    return request.policy == SessionPolicy::end || (request.policy == SessionPolicy::byChange && takesRights);
+    return request.policy == SessionPolicy::end ||
+           (request.policy == SessionPolicy::byChange && request.losingRights.contains(&daemon));
 }
 
 /// The end of sessions, which comes with the step before it.
@@ -180,6 +181,21 @@ void addDaemonSteps(const StagedRequest& request, std::vector<ProgramStep>& prog
     }
 }
 
+/// The sessions end of daemons that need not follow themselves.
+void addLosses(const StagedRequest& request, std::vector<ProgramStep>& program) {
+    if (request.policy == SessionPolicy::keep) {
+        return;
+    }
+    for (const Daemon* daemon : allDaemons()) {
+        const bool follows = std::ranges::find(request.wishes, daemon, &Wish::daemon) != request.wishes.end();
+        if (request.losingRights.contains(daemon) && !follows && sessionCount(*daemon) > 0) {
+            program.push_back(
+                stepOf(StepKind::endSessions, *daemon, Effect::start, SessionPolicy::end, startDaemon));
+            program.back().sessionsEnded = sessionCount(*daemon);
+        }
+    }
+}
+
 std::string textOf(const VELT_FTP_PORT_RANGE& range) {
     return range.first == range.last ? std::to_string(range.first) : formatPortRange(range);
 }
@@ -227,14 +243,7 @@ std::vector<ProgramStep> programOf(const StagedRequest& request) {
         program.push_back({ChangeStep{StepKind::store, file}, {}});
     }
     addDaemonSteps(request, program);
-    const bool concerned =
-        std::ranges::find(request.wishes, &ftpDaemon, &Wish::daemon) != request.wishes.end();
-    if (request.takesFtpRights && !concerned && request.policy != SessionPolicy::keep &&
-        sessionCount(ftpDaemon) > 0) {
-        program.push_back(
-            stepOf(StepKind::endSessions, ftpDaemon, Effect::start, SessionPolicy::end, startDaemon));
-        program.back().sessionsEnded = sessionCount(ftpDaemon);
-    }
+    addLosses(request, program);
     addPortSteps(StepKind::closePort, request.openBefore, request.openAfter, program);
     addPortSteps(StepKind::openPort, request.openAfter, request.openBefore, program);
     for (const HeldJournal::Item& item : request.journal) {

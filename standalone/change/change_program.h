@@ -6,10 +6,12 @@
 #include "standalone/change/daemon_requests.h"
 #include "standalone/change/settings_change.h"
 #include "standalone/core/staged_files.h"
+#include "standalone/daemons/daemon.h"
 #include "standalone/journal/held_journal.h"
 
 #include <functional>
 #include <optional>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -28,7 +30,7 @@ struct StagedRequest {
     OpenPorts openAfter;
     std::vector<HeldJournal::Item> journal;
     SessionPolicy policy = SessionPolicy::byChange;
-    bool takesFtpRights = false; ///< by the settings or the rules
+    std::set<const Daemon*> losingRights; ///< whose sessions may do what the settings or the rules now forbid
 };
 
 /// A step, and how it is done.

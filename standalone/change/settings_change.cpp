@@ -9,12 +9,14 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/core/state_root.h"
 #include "standalone/core/unfinished_change.h"
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/settings/lost_rights.h"
 #include "standalone/settings/settings.h"
 
 #include <algorithm>
 #include <iterator>
 #include <optional>
+#include <set>
 #include <utility>
 
 namespace velt {
@@ -38,11 +40,28 @@ struct Staging {
 struct Former {
     OpenPorts openPorts;
     std::optional<FtpSettings> ftp;
+    std::optional<SftpTerms> sftp;
 };
 
-Former readFormer() {
+/// Of the settings that this thread sees. Nothing where they cannot be read: the daemon's start will tell.
+std::optional<FtpSettings> ftpNow() {
     auto ftp = loadFtpSettings();
-    return {openPorts().valueOr({}), ftp ? std::optional(std::move(*ftp)) : std::nullopt};
+    return ftp ? std::optional(std::move(*ftp)) : std::nullopt;
+}
+
+std::optional<SftpTerms> sftpNow() {
+    auto ftp = ftpNow();
+    const auto confinement = loadConfinementSettings();
+    return ftp && confinement ? std::optional(SftpTerms{std::move(*ftp), *confinement}) : std::nullopt;
+}
+
+Former readFormer() {
+    return {openPorts().valueOr({}), ftpNow(), sftpNow()};
+}
+
+template<class Settings>
+bool takesRightsOf(const std::optional<Settings>& former, const std::optional<Settings>& next) {
+    return former && next && takesRights(*former, *next);
 }
 
 /// A rule may bind whoever is logged in now.
@@ -86,11 +105,18 @@ public:
     }
 
 private:
-    /// Whether open sessions may do what the staged settings do not allow. Where one of them cannot be read,
-    /// the daemon's start will tell.
-    bool takesRightsNow() const {
-        const auto staged = loadFtpSettings();
-        return former_.ftp && staged && takesRights(*former_.ftp, *staged);
+    /// The daemons whose sessions may do what the staged settings or rules do not allow.
+    std::set<const Daemon*> losingRights(const std::vector<StagedFile>& files) const {
+        const bool otherRules = changesRules(files);
+        const auto sftp = sftpNow();
+        std::set<const Daemon*> losing;
+        if (otherRules || takesRightsOf(former_.ftp, ftpNow())) {
+            losing.insert(&ftpDaemon);
+        }
+        if ((otherRules && sftp && sftp->confinement.sftp) || takesRightsOf(former_.sftp, sftp)) {
+            losing.insert(&sftpDaemon);
+        }
+        return losing;
     }
 
     Result<StagedRequest> collect(SessionPolicy policy) const {
@@ -103,7 +129,7 @@ private:
         VELT_ASSIGN_OR_RETURN(request.openAfter, openPorts());
         request.journal = staging_->journal.items();
         request.policy = policy;
-        request.takesFtpRights = changesRules(request.files) || takesRightsNow();
+        request.losingRights = losingRights(request.files);
         return request;
     }
 

@@ -1,7 +1,6 @@
 #include "standalone/control/change_settings.h"
 
-#include "standalone/control/daemon_control.h"
-#include "standalone/control/supervised_daemon.h"
+#include "standalone/control/follow_with_sftp.h"
 #include "standalone/core/effects.h"
 #include "standalone/core/key_value_file.h"
 #include "standalone/core/paths.h"
@@ -9,6 +8,7 @@
 #include "standalone/core/state_lock.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
 #include "standalone/daemons/sshd/sshd_plan.h"
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/settings/settings_store.h"
 
 #include <tuple>
@@ -31,7 +31,8 @@ Result<> check(const FtpSettings& settings) {
 Result<> check(const SftpSettings& settings) {
     VELT_RETURN_IF_ERROR(checkSftpSettings(settings));
     if (settings.enabled) {
-        VELT_ASSIGN_OR_RETURN([[maybe_unused]] const auto hash, testSftpCandidate(settings));
+        VELT_ASSIGN_OR_RETURN(const auto confinement, loadConfinementSettings());
+        VELT_ASSIGN_OR_RETURN([[maybe_unused]] const auto hash, testSftpCandidate(settings, confinement));
     }
     return {};
 }
@@ -56,15 +57,6 @@ Result<> storeExternalAddress(const FtpSettings& settings) {
 /// What of FTP's settings the configuration of SFTP follows from, too.
 auto sharedWithSftp(const FtpSettings& settings) {
     return std::make_tuple(settings.umask, settings.fipsOnly);
-}
-
-/// The listener of a running SFTP service gives way to one with the settings as they are now; its sessions go
-/// on.
-Result<> followWithSftp() {
-    if (!isServing(daemonState(sftpDaemon))) {
-        return {};
-    }
-    return perform(Effect::start, sftpDaemon.name, [] { return startDaemon(sftpDaemon); });
 }
 
 } // namespace

@@ -8,6 +8,8 @@ namespace velt {
 
 struct ConfinementSettings {
     bool sftp = false; ///< a login over SFTP sees what the same login over FTP sees
+
+    bool operator==(const ConfinementSettings&) const = default;
 };
 
 /// The settings of the file

@@ -36,4 +36,10 @@ bool takesRights(const FtpSettings& former, const FtpSettings& next) {
            (encrypts && !former.fipsOnly && next.fipsOnly) || former.umask != next.umask;
 }
 
+bool takesRights(const SftpTerms& former, const SftpTerms& next) {
+    const bool otherFolder = isOn(former.ftp.record.user_chroot) != isOn(next.ftp.record.user_chroot);
+    return (next.confinement.sftp && (!former.confinement.sftp || otherFolder)) ||
+           (!former.ftp.fipsOnly && next.ftp.fipsOnly) || former.ftp.umask != next.ftp.umask;
+}
+
 } // namespace velt

@@ -2,6 +2,7 @@
 #ifndef VELT_STANDALONE_SETTINGS_LOST_RIGHTS_H
 #define VELT_STANDALONE_SETTINGS_LOST_RIGHTS_H
 
+#include "standalone/settings/confinement_settings.h"
 #include "standalone/settings/settings.h"
 
 namespace velt {
@@ -11,6 +12,16 @@ namespace velt {
 /// that users are confined to or the umask of their files is another one. Limits, time-outs, ports, addresses
 /// and forms of names are no rights. A pure function.
 bool takesRights(const FtpSettings& former, const FtpSettings& next);
+
+/// What the configuration of SFTP follows from, beside its own settings.
+struct SftpTerms {
+    FtpSettings ftp;
+    ConfinementSettings confinement;
+};
+
+/// The same for sessions of SFTP: they are confined from now on, and were not; or are confined still, and the
+/// folder is another one; or weak algorithms are off, or the umask is another one. A pure function.
+bool takesRights(const SftpTerms& former, const SftpTerms& next);
 
 } // namespace velt
 

@@ -6,7 +6,6 @@
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/daemon_configuration.h"
 #include "standalone/daemons/sshd/uncovered_functions.h"
-#include "standalone/settings/confinement_settings.h"
 
 #include <syslog.h>
 #include <unistd.h>
@@ -46,8 +45,7 @@ Result<> checkLoadable(const std::filesystem::path& file) {
 
 } // namespace
 
-Result<Confinement> prepareConfinement() {
-    VELT_ASSIGN_OR_RETURN(const auto settings, loadConfinementSettings());
+Result<Confinement> prepareConfinement(const ConfinementSettings& settings) {
     if (!settings.sftp) {
         return Confinement();
     }

@@ -3,6 +3,7 @@
 #define VELT_STANDALONE_DAEMONS_SSHD_CONFINEMENT_H
 
 #include "base/result.h"
+#include "standalone/settings/confinement_settings.h"
 
 #include <filesystem>
 #include <string>
@@ -15,9 +16,9 @@ struct Confinement {
     std::vector<std::string> environment; ///< of the daemon: "NAME=VALUE"
 };
 
-/// As the stored settings have it. None without root's rights, of which the
-/// system's log tells: the daemon serves its own user alone then. Thread-safe.
-Result<Confinement> prepareConfinement();
+/// As the settings have it. None without root's rights, of which the system's log tells: the daemon serves
+/// its own user alone then. Thread-safe.
+Result<Confinement> prepareConfinement(const ConfinementSettings& settings);
 
 /// Our own files with which a session is confined, and what of OpenSSH serves a connection.
 std::vector<std::filesystem::path> filesOfConfinement();

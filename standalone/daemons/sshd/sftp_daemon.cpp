@@ -22,7 +22,8 @@ Result<DaemonSettings> loadSettings() {
 
 Result<std::string> testStored() {
     VELT_ASSIGN_OR_RETURN(const auto stored, loadSftpSettings());
-    return testSftpCandidate(stored);
+    VELT_ASSIGN_OR_RETURN(const auto confinement, loadConfinementSettings());
+    return testSftpCandidate(stored, confinement);
 }
 
 } // namespace

@@ -59,7 +59,7 @@ struct Rendering {
     std::vector<std::string> environment; ///< of the daemon, as arguments of env(1)
 };
 
-Result<Rendering> render(const SftpSettings& settings) {
+Result<Rendering> render(const SftpSettings& settings, const ConfinementSettings& confined) {
     VELT_RETURN_IF_ERROR(makeSeparationFolder());
     VELT_ASSIGN_OR_RETURN(auto keys, hostKeys());
     VELT_RETURN_IF_ERROR(checkRenderable(keys.files.front(), statePath("/")));
@@ -68,7 +68,7 @@ Result<Rendering> render(const SftpSettings& settings) {
     VELT_ASSIGN_OR_RETURN(const auto user, ownUser());
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
     VELT_ASSIGN_OR_RETURN(const auto ftp, loadFtpFile());
-    VELT_ASSIGN_OR_RETURN(auto confinement, prepareConfinement());
+    VELT_ASSIGN_OR_RETURN(auto confinement, prepareConfinement(confined));
     std::string text =
         renderSshd(settings, {ftp.umask, ftp.fipsOnly},
                    {keys.files, keysProgram, user, geteuid() == 0, network.loopbackOnly, confinement.root});
@@ -120,8 +120,8 @@ std::vector<std::string> commandLine(const Rendering& rendering, const std::stri
 
 } // namespace
 
-Result<std::string> testSftpCandidate(const SftpSettings& settings) {
-    VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
+Result<std::string> testSftpCandidate(const SftpSettings& settings, const ConfinementSettings& confinement) {
+    VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings, confinement));
     return testRendering(rendering);
 }
 
@@ -129,7 +129,8 @@ Result<std::optional<DaemonPlan>> planSftpDaemon() {
     VELT_ASSIGN_OR_RETURN(const auto lock, StateLock::take());
     VELT_ASSIGN_OR_RETURN(const auto settings, loadSftpSettings());
     VELT_RETURN_IF_ERROR(checkSftpSettings(settings));
-    VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings));
+    VELT_ASSIGN_OR_RETURN(const auto confinement, loadConfinementSettings());
+    VELT_ASSIGN_OR_RETURN(const auto rendering, render(settings, confinement));
     VELT_ASSIGN_OR_RETURN(const auto hash, testRendering(rendering));
     const auto folder = statePath(paths::sftpConfigurations) / hash;
     const auto configuration = folder / "sshd_config";

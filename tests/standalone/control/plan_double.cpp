@@ -100,7 +100,7 @@ Result<std::string> testFtpCandidate(const FtpSettings& settings) {
     return test::testRendering(test::render(settings));
 }
 
-Result<std::string> testSftpCandidate(const SftpSettings& settings) {
+Result<std::string> testSftpCandidate(const SftpSettings& settings, const ConfinementSettings&) {
     return test::testRendering(test::render(settings));
 }
 

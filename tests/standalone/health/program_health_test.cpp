@@ -109,8 +109,7 @@ TEST_F(ProgramHealth, SftpThatIsNotConfinedIsWorthKnowing) {
         (Findings{{"sftp-not-confined", Severity::notice, "sftp",
                    "SFTP is not confined: its users see the whole server as far as Unix modes let them, "
                    "whatever the rules and the shares grant.",
-                   "printf 'version = 1\\nsftp = 1\\n' >" +
-                       (root_.path() / "etc/velt/confinement.conf").string() + " && veltctl restart sftp"}}));
+                   "veltctl confinement set sftp=on"}}));
     switchOn(true, false);
     EXPECT_EQ(confinementFindings(), Findings()) << "nobody uses it";
     switchOn(true, true);

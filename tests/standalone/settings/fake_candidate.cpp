@@ -27,7 +27,7 @@ Result<std::string> testFtpCandidate(const FtpSettings& settings) {
     return answer();
 }
 
-Result<std::string> testSftpCandidate(const SftpSettings& settings) {
+Result<std::string> testSftpCandidate(const SftpSettings& settings, const ConfinementSettings&) {
     test::fakeCandidate().sftp.push_back(settings);
     return answer();
 }

@@ -60,12 +60,12 @@ protected:
 };
 
 TEST_F(SftpCandidate, isTakenAndLeavesNothingButTheKeys) {
-    EXPECT_EQ(messageOf(testSftpCandidate({true, 2222})), "");
+    EXPECT_EQ(messageOf(testSftpCandidate({true, 2222}, {})), "");
     EXPECT_TRUE(std::filesystem::is_empty(root_.path() / "run/velt"));
 }
 
 TEST_F(SftpCandidate, isRefusedInTheDaemonsOwnWords) {
-    const std::string refusal = messageOf(testSftpCandidate({true, 65536}));
+    const std::string refusal = messageOf(testSftpCandidate({true, 65536}, {}));
     EXPECT_NE(refusal.find("Badly formatted port number"), std::string::npos) << refusal;
 }
 
@@ -76,8 +76,8 @@ TEST_F(SftpCandidate, isTestedWithThrowAwayKeysWhereNothingMayBeStored) {
             effects.push_back(std::string(effectName(effect)) + " " + std::string(subject));
             return EffectDecision(Result<>());
         });
-        EXPECT_EQ(messageOf(testSftpCandidate({true, 2222})), "");
-        EXPECT_NE(messageOf(testSftpCandidate({true, 65536})), "");
+        EXPECT_EQ(messageOf(testSftpCandidate({true, 2222}, {})), "");
+        EXPECT_NE(messageOf(testSftpCandidate({true, 65536}, {})), "");
     }).join();
     EXPECT_EQ(effects, (std::vector<std::string>{"store host keys", "store host keys"}));
     EXPECT_FALSE(std::filesystem::exists(root_.path() / "var/lib/velt/ssh"));
