@@ -17,9 +17,9 @@ using schema::SettingType;
 
 /// The settings behind one "get" and one "set".
 struct SettingGroup {
-    const char* command; ///< the first word of the command: ftp, security or sftp
+    const char* command; ///< the first word of the command: ftp, security, sftp or confinement
     const char* api;
-    int version;
+    int version;                   ///< 0: of no module
     std::vector<Setting> settings; ///< those with a key in this version
 
     ApiMethod method(const char* name) const { return {api, version, name}; }

@@ -19,7 +19,8 @@ namespace {
 
 /// What a "get" answers. Failure when it is no object, or lacks a switch.
 Json::Value readSettings(ApiClient& api, const SettingGroup& group) {
-    Json::Value shown = api.read(group.method("get"));
+    Json::Value shown =
+        group.version == 0 ? api.get("/api/settings")[group.command] : api.read(group.method("get"));
     const auto missing = [&](const Setting& setting) {
         return setting.service != nullptr && !hasType(shown[setting.key], setting.type);
     };

@@ -184,13 +184,22 @@ inline constexpr Setting sftpSettings[] = {
      .number = 22},
 };
 
-/// The settings behind one API.
+inline constexpr Setting confinementSettings[] = {
+    {.key = "sftp",
+     .fileKey = "sftp",
+     .meaning = "A login over SFTP sees what the same login over FTP sees",
+     .number = 1},
+};
+
+/// The settings behind one API, or those of the platform that have none.
 struct SettingGroup {
-    const char* name;  ///< on the command line
-    const char* title; ///< what the settings are, for people
-    const char* api;
-    int newestApiVersion;
+    const char* name;     ///< on the command line
+    const char* title;    ///< what the settings are, for people
+    const char* api;      ///< "" for the platform's
+    int newestApiVersion; ///< 0 for the platform's
     std::span<const Setting> settings;
+
+    constexpr bool isPlatforms() const { return newestApiVersion == 0; }
 };
 
 inline constexpr SettingGroup ftp{"ftp", "the FTP and FTPS settings", "VELT.Core.FileServ.FTP", 3,
@@ -199,9 +208,11 @@ inline constexpr SettingGroup security{"security", "the security settings of FTP
                                        "VELT.Core.FileServ.FTP.Security", 1, securitySettings};
 inline constexpr SettingGroup sftp{"sftp", "the SFTP settings", "VELT.Core.FileServ.FTP.SFTP", 1,
                                    sftpSettings};
+inline constexpr SettingGroup confinement{"confinement", "which services confine their users, beside FTP", "",
+                                          0, confinementSettings};
 
 /// In the order in which people are shown them.
-inline constexpr const SettingGroup* groups[] = {&ftp, &security, &sftp};
+inline constexpr const SettingGroup* groups[] = {&ftp, &security, &sftp, &confinement};
 
 } // namespace velt::schema
 

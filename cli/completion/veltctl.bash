@@ -5,11 +5,12 @@ _veltctl_words() {
     local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
         enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
     case $1 in
-        '') echo 'status doctor restart log events ftp security sftp shares chroot history diff undo confirm access sessions kick transfers bans tokens export import call' ;;
-        ftp | security | sftp) echo 'get set' ;;
+        '') echo 'status doctor restart log events ftp security sftp confinement shares chroot history diff undo confirm access sessions kick transfers bans tokens export import call' ;;
+        ftp | security | sftp | confinement) echo 'get set' ;;
         'ftp set') echo "$ftp utf8_mode=" ;;
         'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
         'sftp set') echo 'enable= portnum=' ;;
+        'confinement set') echo 'sftp=' ;;
         chroot) echo 'users rules' ;;
         restart) echo 'ftp sftp' ;;
         'chroot users') echo 'list add delete' ;;
@@ -31,7 +32,7 @@ _veltctl_options() {
         kick) echo '--user --address --reason --dry-run' ;;
         transfers) echo '--user --session --share --path --operation --result --from --until --before --limit --all --csv' ;;
         'ftp get') echo '--api-version' ;;
-        'ftp set' | 'security set' | 'sftp set' | 'chroot users add' | 'chroot users delete' | 'chroot rules save' | \
+        'ftp set' | 'security set' | 'sftp set' | 'confinement set' | 'chroot users add' | 'chroot users delete' | 'chroot rules save' | \
             'chroot rules add' | 'chroot rules remove' | undo | import)
             echo '--dry-run --keep-sessions --end-sessions --confirm-within' ;;
         history) echo '--before --limit' ;;
@@ -79,7 +80,7 @@ _veltctl_files() {
 # The value of a setting: those that are on or off have names that tell so, or are listed here.
 _veltctl_setting_value() {
     case $1 in
-        enable | enable_* | use_* | custom_port_range | user_chroot | anonymous | anonymous_chroot)
+        enable | enable_* | use_* | custom_port_range | user_chroot | anonymous | anonymous_chroot | sftp)
             COMPREPLY=($(compgen -W 'on off' -- "$2")) ;;
         utf8_mode) COMPREPLY=($(compgen -W '0 1 2' -- "$2")) ;;
     esac

@@ -70,6 +70,15 @@ std::vector<FieldError> ignoredParts(const Json::Value& wanted, const Json::Valu
     return errors;
 }
 
+/// A document that a former version wrote has no section for what came later: it keeps its values.
+Json::Value withLaterSections(Json::Value document, const Json::Value& current) {
+    const char* const name = schema::confinement.name;
+    if (!document.isMember(name)) {
+        document[name] = current[name];
+    }
+    return document;
+}
+
 /// Nothing is staged for a change that is none.
 HttpResponse unchanged(const Json::Value& document, const ChangeOptions& options) {
     ChangeReport report;
@@ -125,7 +134,8 @@ HttpResponse AllSettings::change(const Call& call, bool isPatch) {
     if (!before) {
         return failedUnchanged(before.error(), call.id);
     }
-    const Json::Value wanted = withNames(isPatch ? patched(*before, *body) : *body);
+    const Json::Value wanted =
+        withNames(isPatch ? patched(*before, *body) : withLaterSections(*body, *before));
     return store(*before, wanted, "settings", std::get<ChangeOptions>(options), call);
 }
 
@@ -139,7 +149,7 @@ HttpResponse AllSettings::store(const Json::Value& before, const Json::Value& wa
     if (const auto errors = checkSettings(wanted, before); !errors.empty()) {
         return refused(errors, call.id);
     }
-    if (callsFor(before, wanted).empty()) {
+    if (differences(before, wanted).empty()) {
         return unchanged(before, options);
     }
     const auto made =
@@ -159,6 +169,9 @@ HttpResponse AllSettings::store(const Json::Value& before, const Json::Value& wa
 /// ignored.
 std::optional<HttpResponse> AllSettings::ask(const Json::Value& before, const Json::Value& wanted,
                                              const Call& call) const {
+    if (const auto stored = storePlatformSettings(before, wanted); !stored) {
+        return failedUnchanged(stored.error(), call.id);
+    }
     for (const SettingsCall& each : callsFor(before, wanted)) {
         const Row* const row = table_.find(each.api, each.version, each.method);
         if (row == nullptr) {

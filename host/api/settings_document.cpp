@@ -20,7 +20,7 @@ constexpr const char* rulesApi = "VELT.Core.FileServ.FTP.ChrootUser";
 constexpr int rulesVersion = 2;
 
 /// Restrictions before what they restrict.
-constexpr std::array groupsInOrder{&schema::security, &schema::ftp, &schema::sftp};
+constexpr std::array groupsInOrder{&schema::confinement, &schema::security, &schema::ftp, &schema::sftp};
 
 Result<Json::Value> ask(const Row& row, const Principal& principal) {
     Outcome outcome = callRow(row, Json::Value(Json::objectValue), principal.actor, principal.address);
@@ -159,6 +159,8 @@ Result<Json::Value> readSettingsDocument(const ModuleTable& table, const Princip
             document[group->name] = sectionOf(*group, answer);
         }
     }
+    VELT_ASSIGN_OR_RETURN(const auto confinement, loadConfinementSettings());
+    document[schema::confinement.name] = jsonObject({{"sftp", confinement.sftp}});
     if (const Row* const row = table.find(rulesApi, rulesVersion, "load")) {
         VELT_ASSIGN_OR_RETURN(document[std::string(rulesSection)], readRules(*row, principal));
     }
@@ -198,6 +200,14 @@ IntendedPorts portsIn(const Json::Value& document) {
     return ports;
 }
 
+Result<> storePlatformSettings(const Json::Value& before, const Json::Value& wanted) {
+    const char* const name = schema::confinement.name;
+    if (wanted[name] == before[name]) {
+        return {};
+    }
+    return changeConfinement({.sftp = wanted[name]["sftp"].asBool()});
+}
+
 std::vector<SettingsCall> callsFor(const Json::Value& before, const Json::Value& wanted) {
     std::vector<SettingsCall> calls;
     const std::string rules(rulesSection);
@@ -207,7 +217,7 @@ std::vector<SettingsCall> callsFor(const Json::Value& before, const Json::Value&
     }
     for (const schema::SettingGroup* group : groupsInOrder) {
         const Json::Value changed = changedSettings(*group, before[group->name], wanted[group->name]);
-        if (!changed.empty()) {
+        if (!changed.empty() && !group->isPlatforms()) {
             calls.push_back({group->name, group->api, group->newestApiVersion, "set",
                              completed(*group, changed, wanted[group->name])});
         }

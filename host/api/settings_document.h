@@ -30,9 +30,9 @@ struct FieldChange {
 /// The settings of a group that the document shows: those of the newest version of its API.
 std::vector<const schema::Setting*> documentSettings(const schema::SettingGroup& group);
 
-/// What is stored, for the calling thread: {"format", "format_version", "chroot_rules", "ftp", "security",
-/// "sftp"}. A service that is on but down is on. A section whose module is not loaded is missing. Call it as
-/// a read.
+/// What is stored, for the calling thread: {"format", "format_version", "chroot_rules", "confinement", "ftp",
+/// "security", "sftp"}. A service that is on but down is on. A section whose module is not loaded is missing.
+/// Call it as a read.
 Result<Json::Value> readSettingsDocument(const ModuleTable& table, const Principal& principal);
 
 /// In the order of the document. A passive range that is switched off before and after is no difference: it
@@ -54,8 +54,11 @@ struct SettingsCall {
     Json::Value parameters;
 };
 
-/// The calls that lead from the one document to the other: confinement first, services last. `wanted` passed
-/// checkSettings.
+/// Stores what is the platform's own of the wanted document, where it differs. `wanted` passed checkSettings.
+Result<> storePlatformSettings(const Json::Value& before, const Json::Value& wanted);
+
+/// The calls of modules that lead from the one document to the other: confinement first, services last.
+/// `wanted` passed checkSettings.
 std::vector<SettingsCall> callsFor(const Json::Value& before, const Json::Value& wanted);
 
 } // namespace velt::host

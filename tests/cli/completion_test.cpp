@@ -94,6 +94,8 @@ TEST(CompletionTest, EverySettingIsOffered) {
     std::sort(security.begin(), security.end());
     EXPECT_EQ(offered({"security", "set", ""}), security);
     EXPECT_EQ(offered({"sftp", "set", ""}), keysOf(velt::cli::newestGroupOf(velt::schema::sftp)));
+    EXPECT_EQ(offered({"confinement", "set", ""}),
+              keysOf(velt::cli::newestGroupOf(velt::schema::confinement)));
     EXPECT_EQ(offered({"--json", "--url", "x", "ftp", "set", "portnum", "=", "5", "enable_f"}),
               (Words{"enable_fips=", "enable_flow_ctrl=", "enable_ftp=", "enable_ftps=", "enable_fxp="}));
 }
@@ -101,7 +103,8 @@ TEST(CompletionTest, EverySettingIsOffered) {
 TEST(CompletionTest, SwitchesOfferTheirValues) {
     for (const velt::cli::SettingGroup& group :
          {velt::cli::newestGroupOf(velt::schema::ftp), velt::cli::newestGroupOf(velt::schema::security),
-          velt::cli::newestGroupOf(velt::schema::sftp)}) {
+          velt::cli::newestGroupOf(velt::schema::sftp),
+          velt::cli::newestGroupOf(velt::schema::confinement)}) {
         for (const velt::cli::Setting& setting : group.settings) {
             const Words replies = offered({group.command, "set", setting.key, "="});
             const bool isSwitch = setting.type == velt::cli::SettingType::boolean;

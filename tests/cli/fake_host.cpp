@@ -69,7 +69,7 @@ FakeHost::FakeHost()
                      "enable_flow_ctrl": false, "maxuploadrate": 0, "maxdownloadrate": 0, "max_conn_per_ip": 2})")),
       security(jsonOf(R"({"user_chroot": false, "anonymous": false, "anonymous_chroot": false,
                           "anonymous_chroot_share": "", "enable_umask": false})")),
-      sftp(jsonOf(R"({"enable": false, "portnum": 22})")) {}
+      confinement(jsonOf(R"({"sftp": false})")), sftp(jsonOf(R"({"enable": false, "portnum": 22})")) {}
 
 void FakeHost::answerWith(const std::string& request, HttpReply reply) {
     const std::lock_guard lock(*mutex_);
@@ -129,6 +129,7 @@ Json::Value FakeHost::document() const {
     Json::Value whole = jsonOf(R"({"format": "velt-settings", "format_version": 1})");
     whole["ftp"] = ftp;
     whole["security"] = security;
+    whole["confinement"] = confinement;
     whole["sftp"] = sftp;
     whole["chroot_rules"] = rules;
     return whole;
@@ -161,8 +162,8 @@ HttpReply FakeHost::patch(const std::string& target, const Json::Value& patch) {
     if (patch.isMember("chroot_rules")) {
         put("/chroot_rules", rules, patch["chroot_rules"]);
     }
-    for (auto& [name, section] :
-         std::map<std::string, Json::Value*>{{"ftp", &ftp}, {"security", &security}, {"sftp", &sftp}}) {
+    for (auto& [name, section] : std::map<std::string, Json::Value*>{
+             {"ftp", &ftp}, {"security", &security}, {"confinement", &confinement}, {"sftp", &sftp}}) {
         for (const std::string& key :
              patch[name].isObject() ? patch[name].getMemberNames() : std::vector<std::string>{}) {
             put("/" + name + "/" + key, (*section)[key], patch[name][key]);

@@ -28,6 +28,7 @@ public:
     // What the server holds. Not for use while a request runs.
     Json::Value ftp;
     Json::Value security;
+    Json::Value confinement;
     Json::Value sftp;
     Json::Value rules{Json::arrayValue};
     Json::Value chrootUsers{Json::arrayValue};

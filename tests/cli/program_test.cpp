@@ -29,7 +29,7 @@ TEST_F(ProgramTest, EveryCommandExplainsItself) {
 }
 
 TEST_F(ProgramTest, TheHelpOfSetNamesTheFormOfItsArguments) {
-    for (const char* area : {"ftp", "security", "sftp"}) {
+    for (const char* area : {"ftp", "security", "sftp", "confinement"}) {
         const RunResult result = run({area, "set", "--help"});
         EXPECT_NE(result.out.find("setting key=value ... REQUIRED"), std::string::npos) << result.out;
     }
@@ -57,6 +57,9 @@ TEST_F(ProgramTest, TheCommandsAreTheDocumentedOnes) {
                             "chroot users add",
                             "chroot users delete",
                             "chroot users list",
+                            "confinement",
+                            "confinement get",
+                            "confinement set",
                             "confirm",
                             "diff",
                             "doctor",
@@ -97,6 +100,8 @@ TEST_F(ProgramTest, WhatChangesSomethingHasADryRun) {
                                         "chroot users",
                                         "chroot users list",
                                         "access",
+                                        "confinement",
+                                        "confinement get",
                                         "diff",
                                         "doctor",
                                         "events",

@@ -26,6 +26,17 @@ TEST_F(SettingsTest, GetWritesTheServersObjectAsJson) {
     EXPECT_EQ(jsonOf(run({"sftp", "--json", "get"}).out), host.sftp);
 }
 
+TEST_F(SettingsTest, SettingsOfNoModuleAreReadFromTheDocument) {
+    EXPECT_EQ(jsonOf(run({"confinement", "get", "--json"}).out), host.confinement);
+    EXPECT_EQ(run({"confinement", "get"}).out,
+              "SETTING  VALUE  MEANING\n"
+              "sftp     off    A login over SFTP sees what the same login over FTP sees\n");
+    EXPECT_EQ(run({"confinement", "set", "sftp=on"}).out, "sftp: off -> on\n");
+    EXPECT_EQ(sent(change).at(0), jsonOf(R"({"confinement": {"sftp": true}})"));
+    EXPECT_EQ(run({"confinement", "set", "ftp=on"}).err,
+              "veltctl: Unknown confinement setting \"ftp\".\nWhat to do: Known keys: sftp.\n");
+}
+
 TEST_F(SettingsTest, OneSettingIsChangedAlone) {
     const RunResult result = run({"ftp", "set", "maxuploadrate=5"});
     EXPECT_EQ(result.code, 0) << result.err;

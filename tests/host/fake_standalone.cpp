@@ -82,6 +82,7 @@ public:
     ~FakeChange() override {
         if (!committed_) {
             static_cast<fake::State&>(fake::Platform::instance()) = before_;
+            FakeStandalone::instance().confinement = confinement_;
         }
     }
 
@@ -116,10 +117,17 @@ private:
                                 : std::nullopt;
     }
 
-    velt::ChangeSteps steps() const { return stepsSince(start_); }
+    velt::ChangeSteps steps() const {
+        velt::ChangeSteps all = stepsSince(start_);
+        if (FakeStandalone::instance().confinement != confinement_) {
+            all.push_back({velt::StepKind::store, "confinement settings"});
+        }
+        return all;
+    }
     static int ended(velt::SessionPolicy policy) { return policy == velt::SessionPolicy::keep ? 0 : 3; }
 
     const fake::State before_ = static_cast<const fake::State&>(fake::Platform::instance());
+    const velt::ConfinementSettings confinement_ = FakeStandalone::instance().confinement;
     const std::size_t start_ = fake::Platform::instance().journal.size();
     bool committed_ = false;
 };
@@ -167,6 +175,20 @@ ServiceRequest::~ServiceRequest() = default;
 Result<std::vector<ServiceSessions>> ServiceRequest::finish() {
     open_ = false;
     return FakeStandalone::instance().sessions;
+}
+
+Result<ConfinementSettings> loadConfinementSettings() {
+    const FakeStandalone& fake = FakeStandalone::instance();
+    return fake.confinementFails ? Result<ConfinementSettings>(Error(fake.sentence)) : fake.confinement;
+}
+
+Result<> changeConfinement(const ConfinementSettings& settings) {
+    FakeStandalone& fake = FakeStandalone::instance();
+    if (fake.confinementFails) {
+        return Error(fake.sentence);
+    }
+    fake.confinement = settings;
+    return {};
 }
 
 Result<> startEnabledServices() {

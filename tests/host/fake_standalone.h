@@ -60,6 +60,8 @@ struct FakeStandalone {
     std::vector<std::string> endedSessions;        ///< "ID BY REASON"
     std::vector<velt::OperationRecord> operations; ///< newest first
     velt::OperationFilter askedOperations;         ///< the last one
+    velt::ConfinementSettings confinement;
+    bool confinementFails = false; ///< it can be neither read nor stored: with `sentence`
     velt::ActivitySubscriber activitySubscriber;
     velt::ActivityTotals activity;
     std::uint64_t lostRecords = 0;

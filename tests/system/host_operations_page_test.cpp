@@ -118,7 +118,8 @@ protected:
         Json::Value former = base();
         former[section][key] = fromTo[0];
         patch(former, "?sessions=keep");
-        const int listening = former[section == "sftp" ? "sftp" : "ftp"]["portnum"].asInt();
+        const bool ofSftp = section == "sftp" || section == "confinement";
+        const int listening = former[ofSftp ? "sftp" : "ftp"]["portnum"].asInt();
         const UniqueFd session = connectTo("127.0.0.1", listening);
         ASSERT_GE(session.get(), 0);
         char greeting = 0;
@@ -165,6 +166,29 @@ TEST_F(HostOperationsPage, sessionsEndWhenTheRulesChange) {
     const Json::Value rules =
         jsonOf(R"({"chroot_rules": [{"type": "user", "name": "alice", "path": "/public"}]})");
     EXPECT_EQ(patch(rules, "?dry_run=true")["sessions_ended"], 1);
+}
+
+TEST_F(HostOperationsPage, sftpSessionsEndWhereTheirViewChanges) {
+    Json::Value confined = base();
+    confined["confinement"]["sftp"] = true;
+    confined["security"]["user_chroot"] = false;
+    const auto endedBy = [&](const char* change) {
+        patch(confined, "?sessions=keep");
+        const UniqueFd session = connectTo("127.0.0.1", 2023);
+        char greeting = 0;
+        EXPECT_EQ(::read(session.get(), &greeting, 1), 1);
+        return patch(jsonOf(change), "?dry_run=true")["sessions_ended"].asInt();
+    };
+    const char* const rules = R"({"chroot_rules": [{"type": "user", "name": "alice", "path": "/public"}]})";
+    EXPECT_EQ(endedBy(rules), 1);
+    EXPECT_EQ(endedBy(R"({"security": {"user_chroot": true}})"), 1);
+    EXPECT_EQ(endedBy(R"({"security": {"enable_umask": false}})"), 1);
+    EXPECT_EQ(endedBy(R"({"ftp": {"enable_fips": true}})"), 1);
+    EXPECT_EQ(endedBy(R"({"ftp": {"timeout": 301}})"), 0);
+    EXPECT_EQ(endedBy(R"({"confinement": {"sftp": false}})"), 0);
+    confined["confinement"]["sftp"] = false;
+    EXPECT_EQ(endedBy(rules), 0);
+    EXPECT_EQ(endedBy(R"({"security": {"user_chroot": true}})"), 0);
 }
 
 TEST_F(HostOperationsPage, itsCommandsOnChangesWork) {

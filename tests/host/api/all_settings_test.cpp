@@ -45,7 +45,7 @@ TEST_F(HostSettings, TheDocumentHasEverySectionAndNamesItsForm) {
     const Answer answer = get("/api/settings");
     EXPECT_EQ(answer.status, 200);
     EXPECT_EQ(answer.json().getMemberNames(),
-              (Fields{"chroot_rules", "format", "format_version", "ftp", "security", "sftp"}));
+              (Fields{"chroot_rules", "confinement", "format", "format_version", "ftp", "security", "sftp"}));
     EXPECT_EQ(answer.json()["format"], "velt-settings");
     EXPECT_EQ(ask("GET", "/api/settings", viewer).status, 200);
     EXPECT_EQ(ask("PATCH", "/api/settings", viewer, "{}").status, 403);
@@ -71,6 +71,45 @@ TEST_F(HostSettings, APatchChangesWhatItNames) {
     EXPECT_EQ(platform.sftp.port, 2222);
     EXPECT_EQ(document()["ftp"]["timeout"], 600);
     EXPECT_EQ(access.intended.listeners.at("sftp"), 2222);
+}
+
+TEST_F(HostSettings, ThePlatformsOwnSettingsAreOnesLikeOthers) {
+    const Answer planned = patch(R"({"confinement":{"sftp":true}})", "?dry_run=true");
+    ASSERT_EQ(planned.status, 200) << planned.body;
+    EXPECT_EQ(velt::host::toJson(planned.json()["changes"]),
+              R"([{"field":"/confinement/sftp","from":false,"to":true}])");
+    EXPECT_EQ(planned.json()["effects"][0]["subject"], "confinement settings");
+    EXPECT_FALSE(access.confinement.sftp);
+    ASSERT_EQ(patch(R"({"confinement":{"sftp":true}})").status, 200);
+    EXPECT_TRUE(access.confinement.sftp);
+    EXPECT_EQ(document()["confinement"]["sftp"], true);
+    ASSERT_EQ(post("/api/history/1/undo").status, 200);
+    EXPECT_FALSE(access.confinement.sftp);
+    ASSERT_EQ(patch(R"({"confinement":null})").status, 200);
+    EXPECT_TRUE(access.confinement.sftp) << "the default";
+    EXPECT_EQ(fieldsOf(patch(R"({"confinement":{"sftp":1}})")), Fields{"/confinement/sftp"});
+    EXPECT_EQ(fieldsOf(patch(R"({"confinement":{"ftp":true}})")), Fields{"/confinement/ftp"});
+    EXPECT_EQ(fieldsOf(patch(R"({"confinement":true})")), Fields{"/confinement"});
+}
+
+TEST_F(HostSettings, ADocumentOfAFormerVersionLeavesWhatItDoesNotKnow) {
+    access.confinement.sftp = true;
+    Json::Value former = document();
+    former.removeMember("confinement");
+    former["ftp"]["timeout"] = 600;
+    const Answer answer = put(former);
+    ASSERT_EQ(answer.status, 200) << answer.body;
+    EXPECT_EQ(answer.json()["changes"].size(), 1U);
+    EXPECT_TRUE(access.confinement.sftp);
+}
+
+TEST_F(HostSettings, WhatThePlatformRefusesChangesNothing) {
+    access.confinementFails = true;
+    access.sentence = "Cannot read the file.";
+    EXPECT_EQ(get("/api/settings").status, 500);
+    EXPECT_EQ(patch(R"({"ftp":{"timeout":600}})").status, 500);
+    access.confinementFails = false;
+    EXPECT_NE(document()["ftp"]["timeout"], 600);
 }
 
 TEST_F(HostSettings, RulesOfAccountsWithoutANameAreShownByNumberAndSurviveAnEditOfOthers) {
