@@ -1,6 +1,7 @@
 #include "standalone/login/file_operations.h"
 
 #include "standalone/login/access_files.h"
+#include "standalone/login/name_mode.h"
 #include "standalone/login/place.h"
 
 #include <errno.h>
@@ -185,8 +186,7 @@ static int set_mode(const struct velt_operation* operation) {
     if (open_to_set(&place, operation) < 0) {
         return -1;
     }
-    return leave(&place, fchmodat(place.folder, place.name, operation->mode,
-                                  operation->is_of_link ? AT_SYMLINK_NOFOLLOW : 0));
+    return leave(&place, velt_set_mode_at(place.folder, place.name, operation->mode));
 }
 
 static int set_owner(const struct velt_operation* operation) {
