@@ -90,32 +90,39 @@ static int is_special(const struct in6_addr* address) {
 
 /* An IPv4 address within an IPv6 one. */
 struct form {
-    uint8_t prefix[12];
-    size_t prefix_size;
-    size_t place; /* of the four octets */
-    uint8_t mask; /* that they are hidden with */
+    uint8_t mark[12]; /* by which it is known */
+    size_t mark_place;
+    size_t mark_size;
+    uint8_t places[4]; /* of its octets */
+    uint8_t mask;      /* that they are hidden with */
 };
 
-/* To which a gateway, or the kernel itself, would translate: RFC 6052 and 8215 (NAT64), RFC 3056 (6to4), RFC
- * 4380 (Teredo: the client, and the server), RFC 2765 (SIIT). */
+/* To which a gateway, or the kernel itself, would translate: RFC 6052 and 8215 (NAT64, whose own prefix may
+ * be longer than the one that is reserved), RFC 3056 (6to4), RFC 4380 (Teredo: the client, and the server),
+ * RFC 5214 (ISATAP), RFC 2765 (SIIT). */
 static const struct form forms[] = {
-    {{0x00, 0x64, 0xff, 0x9b}, 12, 12, 0},
-    {{0x00, 0x64, 0xff, 0x9b, 0x00, 0x01}, 6, 12, 0},
-    {{0x20, 0x02}, 2, 2, 0},
-    {{0x20, 0x01, 0x00, 0x00}, 4, 12, 0xff},
-    {{0x20, 0x01, 0x00, 0x00}, 4, 4, 0},
-    {{0, 0, 0, 0, 0, 0, 0, 0, 0xff, 0xff, 0, 0}, 12, 12, 0},
+    {{0x00, 0x64, 0xff, 0x9b}, 0, 12, {12, 13, 14, 15}, 0},
+    {{0x00, 0x64, 0xff, 0x9b, 0x00, 0x01}, 0, 6, {12, 13, 14, 15}, 0},
+    {{0x00, 0x64, 0xff, 0x9b, 0x00, 0x01}, 0, 6, {6, 7, 9, 10}, 0},
+    {{0x00, 0x64, 0xff, 0x9b, 0x00, 0x01}, 0, 6, {7, 9, 10, 11}, 0},
+    {{0x00, 0x64, 0xff, 0x9b, 0x00, 0x01}, 0, 6, {9, 10, 11, 12}, 0},
+    {{0x20, 0x02}, 0, 2, {2, 3, 4, 5}, 0},
+    {{0x20, 0x01, 0x00, 0x00}, 0, 4, {12, 13, 14, 15}, 0xff},
+    {{0x20, 0x01, 0x00, 0x00}, 0, 4, {4, 5, 6, 7}, 0},
+    {{0x00, 0x00, 0x5e, 0xfe}, 8, 4, {12, 13, 14, 15}, 0},
+    {{0x02, 0x00, 0x5e, 0xfe}, 8, 4, {12, 13, 14, 15}, 0},
+    {{0, 0, 0, 0, 0, 0, 0, 0, 0xff, 0xff, 0, 0}, 0, 12, {12, 13, 14, 15}, 0},
 };
 
 /* True when the address has this form. */
 static int translate(const struct form* form, const struct in6_addr* address, struct in6_addr* plain) {
     uint32_t ipv4 = 0;
 
-    if (memcmp(address->s6_addr, form->prefix, form->prefix_size) != 0) {
+    if (memcmp(address->s6_addr + form->mark_place, form->mark, form->mark_size) != 0) {
         return 0;
     }
     for (size_t i = 0; i < sizeof(ipv4); i++) {
-        ipv4 = ipv4 << 8 | (uint8_t)(address->s6_addr[form->place + i] ^ form->mask);
+        ipv4 = ipv4 << 8 | (uint8_t)(address->s6_addr[form->places[i]] ^ form->mask);
     }
     map(ipv4, plain);
     return 1;

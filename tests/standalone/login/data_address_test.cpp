@@ -80,6 +80,11 @@ TEST(DataAddress, isInsideWhereItLeadsToThisServerOrToNobody) {
                                "2002:a9fe:1::",
                                "64:ff9b:1::7f00:1",
                                "64:ff9b:1:2:3:4:7f00:1",
+                               "64:ff9b:1:7f00:0:100::",
+                               "64:ff9b:1:27f:0:1::",
+                               "64:ff9b:1:2:7f:0:100:0",
+                               "2600::5efe:7f00:1",
+                               "2600::200:5efe:7f00:1",
                                "::ffff:0:7f00:1",
                                "2001:0:c633:6409:0:0:80ff:fffe",
                                "2001:0:7f00:1:0:0:39cc:9bf6"}) {
