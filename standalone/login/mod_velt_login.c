@@ -160,17 +160,17 @@ static void on_authenticated(const void* data, void* ignored) {
 
 /* The session is about to enter its root directory. */
 static void on_chroot(const void* root, void* ignored) {
-    int good = FALSE;
+    const char* reason = NULL;
     (void)ignored;
 
     if (session.anon_config != NULL) {
         velt_expect_login();
-        good = make_view(root, TRUE);
-    } else {
-        good = made_for != NULL && session.user != NULL && strcmp(made_for, session.user) == 0;
+        reason = is_banned() ? "banned" : make_view(root, TRUE) ? NULL : "configuration";
+    } else if (made_for == NULL || session.user == NULL || strcmp(made_for, session.user) != 0) {
+        reason = "configuration";
     }
-    if (!good) {
-        velt_note_refused_login("configuration");
+    if (reason != NULL) {
+        velt_note_refused_login(reason);
         pr_response_send(R_530, "Login incorrect.");
         pr_session_end(0);
     }

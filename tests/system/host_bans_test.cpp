@@ -101,15 +101,18 @@ TEST_F(PasswordGuessing, overFtpShutsTheAddressOutOfBothServices) {
 
 TEST_F(PasswordGuessing, endsOnConnectionsThatWereOpenBefore) {
     done({"ftp", "set", "enable_ftp=on"});
+    done({"security", "set", "anonymous=on", "anonymous_chroot=on", "anonymous_chroot_share=public"});
     FtpSession atWork(port, server, guesser);
     ASSERT_EQ(atWork.logIn("alice"), 230);
     FtpSession waiting(port, server, guesser);
+    FtpSession waitingGuest(port, server, guesser);
     FtpSession elsewhere(port, server, other);
     for (int i = 0; i < 3; ++i) {
         EXPECT_EQ(logIn(guesser, ftp, "alice", "wrong"), refused);
     }
     ASSERT_TRUE(becomesBanned(guesser + " ftp ")) << banned();
     EXPECT_EQ(waiting.logIn("alice"), 530) << "the right password";
+    EXPECT_EQ(waitingGuest.logIn("anonymous", "me@example.com"), 530);
     EXPECT_EQ(elsewhere.logIn("alice"), 230);
     EXPECT_EQ(atWork.command("NOOP").code, 200) << "who has logged in goes on";
 }
