@@ -19,11 +19,17 @@ namespace {
 
 // Not among them: what works on a descriptor that is open for writing, and what a session cannot have the
 // daemon do, such as labels of terminals and sockets for forwarding.
-constexpr std::array<std::string_view, 73> changingFunctions{
+constexpr std::array<std::string_view, 79> changingFunctions{
+    "__futimens64",
+    "__futimes64",
+    "__lutimes64",
     "__open64_2",
     "__open_2",
     "__openat64_2",
     "__openat_2",
+    "__utime64",
+    "__utimensat64",
+    "__utimes64",
     "__xmknod",
     "__xmknodat",
     "acl_set_fd",
@@ -31,6 +37,7 @@ constexpr std::array<std::string_view, 73> changingFunctions{
     "chmod",
     "chown",
     "chroot",
+    "closefrom",
     "creat",
     "creat64",
     "fchmod",
@@ -39,9 +46,9 @@ constexpr std::array<std::string_view, 73> changingFunctions{
     "fchownat",
     "fopen",
     "fopen64",
+    "fremovexattr",
     "freopen",
     "freopen64",
-    "fremovexattr",
     "fsetxattr",
     "futimens",
     "futimes",
@@ -92,7 +99,6 @@ constexpr std::array<std::string_view, 73> changingFunctions{
     "utime",
     "utimensat",
     "utimes",
-    "closefrom",
 };
 
 /// A part of a file's text as the structures that stand there; nothing when it is not wholly within the file.
