@@ -19,8 +19,13 @@ bool takeLast(std::string_view& text, std::string_view separator, std::string_vi
     return true;
 }
 
-/// "NAME from ADDRESS port NUMBER ssh2"
-std::optional<IpNetwork> refusedPassword(std::string_view text) {
+struct Failure {
+    std::string_view user;
+    std::optional<IpNetwork> address;
+};
+
+/// " NAME from ADDRESS port NUMBER ssh2"
+std::optional<Failure> refusedPassword(std::string_view text) {
     constexpr std::string_view end = " ssh2";
     if (!text.ends_with(end)) {
         return std::nullopt;
@@ -29,19 +34,24 @@ std::optional<IpNetwork> refusedPassword(std::string_view text) {
     std::string_view port;
     std::string_view address;
     const bool complete = takeLast(text, " port ", port) && takeLast(text, from, address);
-    return complete && parseNumber(port) ? parseIpAddress(address) : std::nullopt;
+    return complete && parseNumber(port) ? std::optional(Failure{text, parseIpAddress(address)})
+                                         : std::nullopt;
 }
 
-/// "REASON for NAME from ADDRESS"
-std::optional<IpNetwork> refusedByPam(std::string_view text) {
+/// " REASON for NAME from ADDRESS"
+std::optional<Failure> refusedByPam(std::string_view text) {
+    constexpr std::string_view before = " for ";
     std::string_view address;
-    const bool complete = takeLast(text, from, address) && text.find(" for ") != std::string_view::npos;
-    return complete ? parseIpAddress(address) : std::nullopt;
+    if (!takeLast(text, from, address)) {
+        return std::nullopt;
+    }
+    const std::size_t name = text.find(before);
+    return name == std::string_view::npos
+               ? std::nullopt
+               : std::optional(Failure{text.substr(name + before.size() - 1), parseIpAddress(address)});
 }
 
-} // namespace
-
-std::optional<IpNetwork> failedSftpLogin(std::string_view message) {
+std::optional<Failure> failureIn(std::string_view message) {
     constexpr std::string_view password = "Failed password for ";
     // The daemon writes of the keyboard-interactive method by itself only after some failures, and PAM
     // always.
@@ -51,6 +61,27 @@ std::optional<IpNetwork> failedSftpLogin(std::string_view message) {
         return refusedPassword(message.substr(password.size() - 1));
     }
     return message.starts_with(pam) ? refusedByPam(message.substr(pam.size() - 1)) : std::nullopt;
+}
+
+} // namespace
+
+std::optional<IpNetwork> failedSftpLogin(std::string_view message) {
+    const auto failure = failureIn(message);
+    return failure ? failure->address : std::nullopt;
+}
+
+std::string userOfFailedSftpLogin(std::string_view message) {
+    const auto failure = failureIn(message);
+    if (!failure || !failure->address) {
+        return "";
+    }
+    std::string_view user = failure->user;
+    for (const std::string_view unknown : {" invalid user ", " illegal user "}) {
+        if (user.starts_with(unknown)) {
+            return std::string(user.substr(unknown.size()));
+        }
+    }
+    return std::string(user.substr(user.empty() ? 0 : 1));
 }
 
 std::optional<IpNetwork> failedFtpLogin(std::string_view message) {

@@ -9,6 +9,7 @@
 #include "base/ip_network.h"
 
 #include <optional>
+#include <string>
 #include <string_view>
 
 namespace velt {
@@ -17,7 +18,11 @@ namespace velt {
 /// is refused is no guess: clients try all that they have.
 std::optional<IpNetwork> failedSftpLogin(std::string_view message);
 
-/// The same for a message of the FTP daemon, which has it from our login module.
+/// The name that was given with it: of the client's choosing, up to the end of what the daemon writes of it;
+/// "" where there is none. The words "invalid user" before it are the daemon's.
+std::string userOfFailedSftpLogin(std::string_view message);
+
+/// As failedSftpLogin for a message of the FTP daemon, which has it from our login module.
 std::optional<IpNetwork> failedFtpLogin(std::string_view message);
 
 } // namespace velt

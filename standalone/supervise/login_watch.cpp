@@ -2,6 +2,7 @@
 
 #include "base/text.h"
 #include "base/turn_queue.h"
+#include "standalone/activity/session_activity.h"
 #include "standalone/bans/failed_login.h"
 #include "standalone/bans/failure_counter.h"
 #include "standalone/bans/login_guard.h"
@@ -23,6 +24,8 @@ namespace {
 struct Readers {
     std::optional<IpNetwork> (*failed)(std::string_view message);
     std::optional<RefusedLogin> (*refused)(std::string_view message);
+    /// The name that failed; null where the daemon's sessions record that themselves.
+    std::string (*user)(std::string_view message);
     const char* name; ///< of the service, for people
 };
 
@@ -68,15 +71,31 @@ TurnQueue* startQueue(TurnQueue::Work work) {
     return queue;
 }
 
+/// Writes down a password that the SFTP daemon refused: no session of ours has begun then that could. `item`
+/// is the address, a line break, and the name.
+void record(const std::string& item) {
+    std::string_view user = item;
+    const std::string address(cut(user, '\n'));
+    const std::string name(user);
+    velt_begin_activity(statePath("/").c_str());
+    const velt_session session{velt_sftp, "", name.c_str(), "", address.c_str(), ""};
+    velt_login_was_refused(&session, "password");
+}
+
 // A ban, and the log, wait for whoever changes settings, who may be waiting for this supervisor: the listener
 // only notes what it heard. The queues are never destroyed, which would wait for what they do.
 DaemonProcess::Listener listenFor(const std::string& service, const Readers& readers) {
     auto* const failures = startQueue([service](const std::string& address) { count(service, address); });
     auto* const refusals = startQueue([name = readers.name, reasons = std::make_shared<ReasonsOfLate>()](
                                           const std::string& item) { log(name, item, *reasons); });
-    return [failures, refusals, readers](std::string_view message) {
+    auto* const records = startQueue(record);
+    return [failures, refusals, records, readers](std::string_view message) {
         if (const auto address = readers.failed(message)) {
             failures->add(toText(sourceOf(*address)), toText(*address));
+            if (readers.user != nullptr) {
+                const std::string item = toText(*address) + '\n' + readers.user(message);
+                records->add(item, item);
+            }
         } else if (const auto refused = readers.refused(message)) {
             refusals->add(refused->reason, refused->user + '\n' + refused->reason);
         }
@@ -93,10 +112,11 @@ DaemonProcess::Listener watchLogins(const std::filesystem::path& folder, const s
     const std::string root = text.substr(0, text.size() - paths::run.size());
     setStateRoot(root.empty() ? "/" : root);
     if (daemon == "ftpd") {
-        return listenFor("ftp", {failedFtpLogin, refusedFtpLogin, "FTP"});
+        return listenFor("ftp", {failedFtpLogin, refusedFtpLogin, nullptr, "FTP"});
     }
-    return daemon == "sftp" ? listenFor("sftp", {failedSftpLogin, refusedSftpLogin, "SFTP"})
-                            : DaemonProcess::Listener();
+    return daemon == "sftp"
+               ? listenFor("sftp", {failedSftpLogin, refusedSftpLogin, userOfFailedSftpLogin, "SFTP"})
+               : DaemonProcess::Listener();
 }
 
 } // namespace velt

@@ -10,7 +10,8 @@
 namespace velt {
 
 /// Counts the failed logins of this daemon against their addresses, and writes those that our own part of it
-/// refused into the administrator log, each reason once a minute. In threads of its own that go on until the
+/// refused into the administrator log, each reason once a minute; a password that SFTP refused is recorded as
+/// sessions record what they do. In threads of its own that go on until the
 /// process ends, without destructors of static objects: by _exit(). To be called once. `folder` is that
 /// of the files about running daemons: it shows which state root this process works for, which is set.
 /// Nothing listens when the folder is not that of a state root.

@@ -33,6 +33,20 @@ TEST(FailedSftpLogin, IsARefusedPassword) {
               "192.0.2.7");
 }
 
+TEST(FailedSftpLogin, HasTheNameThatWasGiven) {
+    const auto nameIn = userOfFailedSftpLogin;
+    EXPECT_EQ(nameIn("Failed password for alice from 192.0.2.7 port 53076 ssh2\r\n"), "alice");
+    EXPECT_EQ(nameIn("Failed password for invalid user no such from 192.0.2.7 port 5 ssh2"), "no such");
+    EXPECT_EQ(nameIn("Failed password for invalid user  from 192.0.2.7 port 53076 ssh2"), "");
+    EXPECT_EQ(
+        nameIn("Failed password for invalid user a from 1.2.3.4 port 1 ssh2 from 192.0.2.7 port 5 ssh2"),
+        "a from 1.2.3.4 port 1 ssh2");
+    EXPECT_EQ(nameIn("PAM: Authentication failure for alice from 192.0.2.7\r\n"), "alice");
+    EXPECT_EQ(nameIn("PAM: User not known for illegal user x for y from 192.0.2.7\r\n"), "x for y");
+    EXPECT_EQ(nameIn("Accepted password for alice from 192.0.2.7 port 53076 ssh2\r\n"), "");
+    EXPECT_EQ(nameIn("Failed password for "), "");
+}
+
 TEST(FailedSftpLogin, IsNotWhatCameBeforeOrAfterIt) {
     for (const char* message : {
              "Server listening on 0.0.0.0 port 42022.\r\n",

@@ -1,6 +1,7 @@
 // What a supervisor makes of its daemon's words about logins.
 
 #include "base/file.h"
+#include "standalone/activity/spool_text.h"
 #include "standalone/bans/ban_list.h"
 #include "standalone/control/supervised_daemon.h"
 #include "standalone/core/state_lock.h"
@@ -76,6 +77,31 @@ TEST_F(LoginWatch, ANameWithLineBreaksAccusesNobodyElse) {
     EXPECT_EQ(bannedAfter(sftpDaemon, {"Failed password for invalid user " + name +
                                        " from 192.0.2.7 port 53076 ssh2\r\n"}),
               R"({ "192.0.2.7" })");
+}
+
+TEST_F(LoginWatch, RefusedPasswordsOfSftpAreRecorded) {
+    bannedAfter(sftpDaemon, {"Failed password for alice from 192.0.2.7 port 53076 ssh2\r\n",
+                             "Failed password for alice from 192.0.2.7 port 53077 ssh2\r\n",
+                             "Failed password for invalid user x\ny from 192.0.2.8 port 5 ssh2\r\n"});
+    std::multiset<std::string> recorded;
+    EXPECT_TRUE(waitUntil(
+        [&] {
+            recorded.clear();
+            for (const OperationRecord& each :
+                 parseSpool(readFile(statePath("/var/lib/velt/transfers/spool")).valueOr("")).records) {
+                recorded.insert(std::string(operationName(each.operation)) + " " +
+                                std::string(protocolName(each.protocol)) + " " + each.user + " " +
+                                each.address + " " + each.reason);
+            }
+            return recorded.size() >= 4;
+        },
+        patience));
+    EXPECT_EQ(recorded, (std::multiset<std::string>{
+                            "login-refused sftp alice 192.0.2.7 password",
+                            "login-refused sftp alice 192.0.2.7 password",
+                            "login-refused sftp bob 198.51.100.1 password",
+                            "login-refused sftp x\ny 192.0.2.8 password",
+                        }));
 }
 
 TEST_F(LoginWatch, MessagesThatComeAtOnceAreReadOneByOne) {
