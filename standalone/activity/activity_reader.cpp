@@ -3,6 +3,7 @@
 #include "standalone/activity/activity_settings.h"
 #include "standalone/activity/running_transfers.h"
 #include "standalone/activity/spool_reader.h"
+#include "standalone/activity/transfer_log.h"
 #include "standalone/core/paths.h"
 #include "standalone/core/state_root.h"
 
@@ -110,6 +111,11 @@ public:
         return problem_;
     }
 
+    std::string logProblem() {
+        const std::lock_guard lock(mutex_);
+        return logProblem_;
+    }
+
 private:
     void run();
     Clock::duration round();
@@ -120,6 +126,7 @@ private:
     void tellRunning(const std::vector<Activity>& running);
     void tell(const OperationRecord& record);
     void note(const Result<>& outcome);
+    void log(const std::vector<OperationRecord>& records);
     bool waitFor(Clock::duration time);
 
     std::mutex running_; ///< one start or stop at a time
@@ -130,6 +137,7 @@ private:
     bool ending_ = false;
     ActivityTotals totals_;
     std::string problem_;
+    std::string logProblem_;
 
     // The thread's own.
     std::unique_ptr<OperationStore> store_;
@@ -174,6 +182,7 @@ Result<bool> Reader::take() {
     for (const OperationRecord& record : taken.records) {
         tell(record);
     }
+    log(taken.records);
     if (Clock::now() >= nextTrim_) {
         VELT_RETURN_IF_ERROR(trim());
     }
@@ -185,6 +194,20 @@ Result<> Reader::trim() {
     VELT_ASSIGN_OR_RETURN(const bool more, store_->trim(settings.limits, std::chrono::system_clock::now()));
     nextTrim_ = Clock::now() + (more ? Clock::duration(betweenTakes) : Clock::duration(betweenTrims));
     return {};
+}
+
+/// Others read that log; what fails there keeps nothing from the store.
+void Reader::log(const std::vector<OperationRecord>& records) {
+    if (records.empty()) {
+        return;
+    }
+    const auto settings = loadActivitySettings();
+    if (!settings) { // health tells of it
+        return;
+    }
+    const auto written = writeTransferLog(*settings, records);
+    const std::lock_guard lock(mutex_);
+    logProblem_ = written ? "" : written.error().message;
 }
 
 void Reader::note(const Result<>& outcome) {
@@ -269,6 +292,10 @@ ActivityTotals activityTotals() {
 
 std::string activityProblem() {
     return reader().problem();
+}
+
+std::string transferLogProblem() {
+    return reader().logProblem();
 }
 
 } // namespace velt

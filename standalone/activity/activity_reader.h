@@ -73,6 +73,9 @@ std::optional<std::chrono::system_clock::time_point> lastLostRecord();
 /// Why the reader cannot take over at this moment, in a sentence; "" when it can.
 std::string activityProblem();
 
+/// Why the last records did not go into the log for other programs, in a sentence; "" when they did.
+std::string transferLogProblem();
+
 } // namespace velt
 
 #endif

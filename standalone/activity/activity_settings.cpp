@@ -25,6 +25,8 @@ Result<ActivitySettings> loadActivitySettings() {
     limits.age = std::chrono::days(file.number("max_age_days", 0, mostDays, limits.age.count(), optionalKey));
     limits.size =
         megabyte * file.number("max_size_mb", 0, mostMegabytes, limits.size / megabyte, optionalKey);
+    settings.xferlog = file.boolean("xferlog", settings.xferlog, optionalKey);
+    settings.syslog = file.boolean("syslog", settings.syslog, optionalKey);
     VELT_RETURN_IF_ERROR(file.finish());
     return settings;
 }

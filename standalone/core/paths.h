@@ -36,6 +36,7 @@ inline constexpr std::string_view spools =
 inline constexpr std::string_view hostKeys = "/var/lib/velt/ssh"; ///< a folder
 inline constexpr std::string_view ownCertificate = "/var/lib/velt/tls/server.crt";
 inline constexpr std::string_view ownKey = "/var/lib/velt/tls/server.key";
+inline constexpr std::string_view transferLog = "/var/log/velt/xferlog";
 inline constexpr std::string_view events = "/var/log/velt/events.jsonl"; ///< and older ones, ".1" to ".4"
 
 // What does not outlive a boot.

@@ -28,6 +28,12 @@ Finding stuck(const std::string& problem) {
             aside + " && mv " + store.string() + "* " + aside};
 }
 
+Finding notLogged(const std::string& problem) {
+    return {"xferlog-stuck", Severity::warning, "sessions",
+            problem + " Programs that read this log do not learn what sessions do; veltctl transfers has it.",
+            "See that the file can be written, run: ls -ld " + statePath(paths::transferLog).string()};
+}
+
 } // namespace
 
 Findings activityFindings(TimePoint now) {
@@ -37,6 +43,9 @@ Findings activityFindings(TimePoint now) {
     }
     if (const std::string problem = activityProblem(); !problem.empty()) {
         findings.push_back(stuck(problem));
+    }
+    if (const std::string problem = transferLogProblem(); !problem.empty()) {
+        findings.push_back(notLogged(problem));
     }
     return findings;
 }
