@@ -93,11 +93,19 @@ velt::Result<velt::ViewReport> sftpView(const velt::ViewReport& ftp) {
     return all;
 }
 
+/// Neither daemon lets it in, whatever the rules say.
+velt::ViewReport refusedRoot() {
+    velt::ViewReport none;
+    none.refused = "The services let no account with the user number 0 log in.";
+    return none;
+}
+
 velt::Result<Json::Value> report(const std::string& name, const char* path) {
     VELT_ASSIGN_OR_RETURN(const auto user, velt::findUser(name));
     VELT_ASSIGN_OR_RETURN(const auto login, ftpLogin(user));
-    const auto ftp = velt::reportView(login);
-    VELT_ASSIGN_OR_RETURN(const auto sftp, sftpView(ftp));
+    const auto ftp = user.uid == 0 ? refusedRoot() : velt::reportView(login);
+    VELT_ASSIGN_OR_RETURN(const auto sftp,
+                          user.uid == 0 ? velt::Result<velt::ViewReport>(refusedRoot()) : sftpView(ftp));
     Json::Value result = jsonObject(
         {{"user", jsonObject({{"name", text(user.name)},
                               {"uid", user.uid},

@@ -2,6 +2,10 @@
 
 #include "standalone/login/open_folder.h"
 
+extern "C" {
+#include "standalone/login/own_names.h"
+}
+
 #include <algorithm>
 
 namespace velt {
@@ -106,10 +110,35 @@ SeenPath describe(const SeenFolder& seen, const PathRights& rights) {
     return found;
 }
 
+/// Whether sessions keep the place from being changed, since programs may obey what is there.
+bool isKept(const ViewReport& view, const std::filesystem::path& place) {
+    if (view.home.empty() || !isWithin(place, view.home)) {
+        return false;
+    }
+    const auto below = place.lexically_relative(view.home);
+    return velt_is_own_name(below.begin()->c_str()) != 0;
+}
+
+SeenPath bestIn(const ViewReport& view, const PathRights& rights) {
+    SeenPath best{"", Access::none, "It is in no folder that the login sees."};
+    for (const SeenFolder& seen : view.folders) {
+        if (!isWithin(rights.place, seen.folder)) {
+            continue;
+        }
+        SeenPath found = describe(seen, rights);
+        if (best.path.empty() || found.access > best.access) {
+            best = std::move(found);
+        }
+    }
+    return best;
+}
+
 } // namespace
 
 ViewReport reportView(const Login& login) {
     ViewReport result;
+    std::error_code none;
+    result.home = login.home.empty() ? std::filesystem::path() : std::filesystem::canonical(login.home, none);
     if (const Result<> reported = report(login, result); !reported) {
         result.refused = reported.error().message;
         result.folders.clear();
@@ -124,15 +153,10 @@ SeenPath findInView(const ViewReport& view, const PathRights& rights) {
     if (view.isWholeServer) {
         return {rights.place.string(), rights.access, rights.reason};
     }
-    SeenPath best{"", Access::none, "It is in no folder that the login sees."};
-    for (const SeenFolder& seen : view.folders) {
-        if (!isWithin(rights.place, seen.folder)) {
-            continue;
-        }
-        SeenPath found = describe(seen, rights);
-        if (best.path.empty() || found.access > best.access) {
-            best = std::move(found);
-        }
+    SeenPath best = bestIn(view, rights);
+    if (best.access == Access::write && isKept(view, rights.place)) {
+        best.access = Access::read;
+        best.reason = "Sessions may not change it: programs obey what begins with a dot in a home.";
     }
     return best;
 }

@@ -32,6 +32,7 @@ struct ViewReport {
     std::vector<SeenFolder> folders;
     std::vector<UnseenShare> unseen; ///< where shares are shown side by side
     std::vector<std::string> remarks;
+    std::filesystem::path home; ///< of the login, without links; "" where there is none
 };
 
 /// Decides as a login now would. For processes of one thread that run as root.

@@ -73,6 +73,7 @@ TEST_F(HostAccessReports, findAFile) {
     EXPECT_TRUE(done({"access", "alice", "/etc/passwd"}).starts_with("FTP: nothing. It is in no folder"));
     EXPECT_EQ(veltctl({"access", "alice", "/etc/none"}).exitCode, 3);
     EXPECT_EQ(veltctl({"access", "no-such-user"}).exitCode, 3);
+    EXPECT_EQ(report("root")["refused"], "The services let no account with the user number 0 log in.");
 }
 
 } // namespace

@@ -55,6 +55,23 @@ protected:
     Login login_;
 };
 
+TEST_F(ViewReports, TellWhatIsKeptInAHome) {
+    login_.view = DefaultView::home;
+    ASSERT_EQ(chown(place("home").c_str(), 4711, 4711), 0);
+    root_.write("home/.ssh/authorized_keys", "x");
+    root_.write("home/letter", "x");
+    for (const char* own : {"home/.ssh", "home/.ssh/authorized_keys", "home/letter"}) {
+        ASSERT_EQ(chown(place(own).c_str(), 4711, 4711), 0);
+    }
+    EXPECT_EQ(seen("home/letter").access, Access::write);
+    EXPECT_EQ(seen("home").access, Access::write);
+    for (const char* kept : {"home/.ssh", "home/.ssh/authorized_keys"}) {
+        EXPECT_EQ(seen(kept).access, Access::read) << kept;
+        EXPECT_EQ(seen(kept).reason,
+                  "Sessions may not change it: programs obey what begins with a dot in a home.");
+    }
+}
+
 TEST_F(ViewReports, TellWhichGrantOpensAShareAndWhichClosesIt) {
     ShareEntry hidden = share("hidden", "music", {{"ann", Access::write}});
     hidden.offeredToFtp = false;
