@@ -100,7 +100,7 @@ Result<bool> isThere(const fs::path& path) {
 
 // Each new folder is made durable in the one that holds it, or a crash could take it away again together with
 // the file that was stored in it.
-Result<> makeFolder(const fs::path& folder) {
+Result<> makeFolder(const fs::path& folder, mode_t mode) {
     std::vector<fs::path> missing;
     for (fs::path at = folder; !at.empty() && !fileExists(at); at = at.parent_path()) {
         missing.push_back(at);
@@ -108,7 +108,7 @@ Result<> makeFolder(const fs::path& folder) {
             break;
     }
     for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
-        if (::mkdir(at->c_str(), 0755) != 0 && errno != EEXIST)
+        if (::mkdir(at->c_str(), *at == folder ? mode : 0755) != 0 && errno != EEXIST)
             return cannot("make the folder", *at);
         VELT_RETURN_IF_ERROR(syncFolder(at->has_parent_path() ? at->parent_path() : fs::path(".")));
     }

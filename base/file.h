@@ -46,8 +46,8 @@ bool fileExists(const std::filesystem::path& path);
 /// The same; an error when that cannot be told.
 Result<bool> isThere(const std::filesystem::path& path);
 
-/// Makes the folder, and those above it, where they are missing; durable on return.
-Result<> makeFolder(const std::filesystem::path& folder);
+/// Makes the folder with this mode, and those above it with 0755, where they are missing; durable on return.
+Result<> makeFolder(const std::filesystem::path& folder, mode_t mode = 0755);
 
 } // namespace velt
 
