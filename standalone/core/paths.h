@@ -22,6 +22,8 @@ inline constexpr std::string_view ftpPasswd = "/etc/velt/ftp.passwd"; ///< for a
 inline constexpr std::string_view ftpGroup = "/etc/velt/ftp.group";
 inline constexpr std::string_view givenCertificate = "/etc/velt/tls/server.crt";
 inline constexpr std::string_view givenKey = "/etc/velt/tls/server.key";
+inline constexpr std::string_view userKeys =
+    "/etc/velt/keys"; ///< a folder, one file for each user with public keys
 inline constexpr std::string_view runKeys = "/etc/velt/run-keys"; ///< a folder, one file for each service
 inline constexpr std::string_view systemInformation = "/etc/veltinfo.conf"; ///< shared with other programs
 

@@ -6,6 +6,7 @@
 #include "standalone/firewall/firewall_settings.h"
 #include "standalone/journal/admin_log.h"
 #include "standalone/journal/log_retention.h"
+#include "standalone/keys/key_store.h"
 #include "standalone/ports/known_services.h"
 #include "standalone/rules/chroot_users.h"
 #include "standalone/rules/rule_store.h"
@@ -15,6 +16,7 @@
 #include "tests/standalone/crash/killed_process.h"
 #include "tests/standalone/crash/stores.h"
 #include "tests/standalone/supervise/daemon_test.h"
+#include "tests/standalone/support/example_keys.h"
 #include "tests/standalone/support/store_shares.h"
 #include "tests/support/fault_sweep.h"
 #include "tests/support/ports.h"
@@ -77,6 +79,13 @@ const Reading readings[] = {
     {"Bans",
      [] { return told(bansAt(Ban::Clock::now()), [](const auto& bans) { return bans.at(0).service; }); },
      "read: sftp"},
+    {"KeysOfAUser",
+     [] {
+         return told(loadKeyFile("ann"),
+                     [](const auto& file) { return file ? file->keys.at(0).by : "none"; });
+     },
+     "read: root"},
+    {"UsersWithKeys", [] { return told(usersWithKeys(), joined); }, "read: ann "},
     {"BanSettings",
      [] { return told(loadBanSettings(), [](const auto& bans) { return std::to_string(bans.failures); }); },
      "read: 3"},
@@ -117,6 +126,7 @@ protected:
         const auto tomorrow =
             std::chrono::ceil<std::chrono::hours>(Ban::Clock::now()) + std::chrono::hours(24);
         ASSERT_TRUE(storeBan({*parseIpNetwork("192.0.2.7"), tomorrow, "sftp", 4}, Ban::Clock::now()));
+        ASSERT_TRUE(storeKeyFile({"ann", 1000, {{keyOf(aKey), "then", "root"}}}));
         root_.write("/etc/veltinfo.conf", "ftp_ext_ip=192.0.2.1\n");
         root_.write("/etc/velt/log.conf", "version = 1\nmax_age_days = 7\n");
         root_.write("/etc/velt/bans.conf", "version = 1\nfailures = 3\n");

@@ -10,10 +10,13 @@
 #include "standalone/contract/last_error.h"
 #include "standalone/contract/string_map.h"
 #include "standalone/control/start_failure.h"
+#include "standalone/core/state_lock.h"
 #include "standalone/journal/event_file.h"
+#include "standalone/keys/key_store.h"
 #include "standalone/settings/settings.h"
 #include "standalone/standalone.h"
 #include "tests/standalone/crash/killed_process.h"
+#include "tests/standalone/support/example_keys.h"
 
 #include <cstring>
 #include <map>
@@ -139,6 +142,23 @@ int fillEvents() {
     return result < 0 || replaceFile(statePath("/var/log/velt/events.jsonl"), full, 0640) ? result : -1;
 }
 
+int storeKeys(const std::vector<std::string>& keys) {
+    KeyFile file{"ann", 1000, {}};
+    for (const std::string& key : keys) {
+        file.keys.push_back({keyOf(key), "then", "root"});
+    }
+    const auto lock = StateLock::take();
+    return toContract(lock ? storeKeyFile(file) : Result<>(lock.error()));
+}
+
+std::string readKeys() {
+    const auto file = loadKeyFile("ann");
+    if (!file) {
+        return "unreadable: " + file.error().message;
+    }
+    return *file ? keysForDaemon(**file, 1000) : "no file";
+}
+
 /// How often each event stands there, in whole lines.
 std::string readEvents() {
     std::string all;
@@ -185,6 +205,11 @@ const Store table[] = {
          return storeRules({"u:1000:/home", "u:1001:/public"});
      },
      [] { return VELTFTPDeleteChrootUser(List({"ann"}).get()); }, readRules},
+    {"KeysOfAUser", [] { return storeKeys({aKey}); },
+     [] {
+         return storeKeys({anotherKey, aKey});
+     },
+     readKeys},
     {"ARunKey", [] { return VLIBServicecfgRunKeySet("ftpd", 1); },
      [] { return VLIBServicecfgRunKeySet("ftpd", 2); }, [] { return fileText("/etc/velt/run-keys/ftpd"); }},
     {"TheLog", logAnew, [] { return logText("new"); }, readLog},
