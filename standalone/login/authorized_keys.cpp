@@ -3,6 +3,7 @@
 #include "base/file.h"
 #include "base/text.h"
 #include "standalone/core/error_number.h"
+#include "standalone/keys/key_options.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -14,30 +15,15 @@ namespace {
 
 constexpr off_t largestFile = off_t{1024} * 1024;
 
-/// What comes before the first blank that is not within quotes: the options, or the kind of the key where
-/// there are none. Nothing when a quote is not closed.
-std::optional<std::string_view> firstField(std::string_view line) {
-    bool quoted = false;
-    std::size_t i = 0;
-    for (; i < line.size() && (quoted || (line[i] != ' ' && line[i] != '\t')); ++i) {
-        if (line[i] == '\\' && line.substr(i + 1).starts_with('"')) {
-            ++i;
-        } else if (line[i] == '"') {
-            quoted = !quoted;
-        }
-    }
-    return quoted ? std::nullopt : std::optional(line.substr(0, i));
-}
-
 /// The line as the daemon may have it; "" for none.
 std::string lineForTransfer(std::string_view line) {
     line = trimmed(line);
-    const auto field = firstField(line);
-    if (line.empty() || line.front() == '#' || line.find('\0') != std::string_view::npos || !field) {
+    const auto length = lengthOfOptions(line); // or of the key's type where there are none
+    if (line.empty() || line.front() == '#' || line.find('\0') != std::string_view::npos || !length) {
         return {};
     }
     // Also where it is part of another option's value: who wrote that is not to be surprised.
-    const std::string options = lowerCase(*field);
+    const std::string options = lowerCase(line.substr(0, *length));
     if (options.find("command=") != std::string::npos) {
         return {};
     }

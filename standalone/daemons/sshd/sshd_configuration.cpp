@@ -51,7 +51,8 @@ std::string renderSshd(const SftpSettings& settings, const SharedSettings& share
     // that others than root may change, as where this one is built; env is the system's own.
     text += "AuthorizedKeysFile none\n"
             "AuthorizedKeysCommand /usr/bin/env \"" +
-            places.keysProgram.string() + "\" %u\n" + "AuthorizedKeysCommandUser " + places.ownUser + "\n";
+            places.keysProgram.string() + "\" %u \"" + places.state.string() + "\"\n" +
+            "AuthorizedKeysCommandUser " + places.ownUser + "\n";
     if (!places.sessionRoot.empty()) {
         text += "ChrootDirectory \"" + places.sessionRoot.string() + "\"\n";
     }

@@ -13,6 +13,7 @@ namespace velt {
 struct SshdPlaces {
     std::vector<std::filesystem::path> hostKeys; ///< absolute, without quotes, control characters and '%'
     std::filesystem::path keysProgram;           ///< velt-authorized-keys, absolute, as above
+    std::filesystem::path state;                 ///< the state root, as above
     std::string ownUser;                         ///< the user of this process, a plain name
     bool privileged = true;    ///< else the daemon serves its own user alone, with keys and without passwords
     bool loopbackOnly = false; ///< clients of this machine only, over IPv4

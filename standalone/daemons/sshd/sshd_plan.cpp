@@ -63,15 +63,16 @@ Result<Rendering> render(const SftpSettings& settings, const ConfinementSettings
     VELT_RETURN_IF_ERROR(makeSeparationFolder());
     VELT_ASSIGN_OR_RETURN(auto keys, hostKeys());
     VELT_RETURN_IF_ERROR(checkRenderable(keys.files.front(), statePath("/")));
+    VELT_RETURN_IF_ERROR(checkRenderable(statePath("/"), statePath("/"))); // the keys may be elsewhere
     const auto keysProgram = installedFile("velt-authorized-keys");
     VELT_RETURN_IF_ERROR(checkRenderable(keysProgram, keysProgram.parent_path()));
     VELT_ASSIGN_OR_RETURN(const auto user, ownUser());
     VELT_ASSIGN_OR_RETURN(const auto network, loadNetworkSettings());
     VELT_ASSIGN_OR_RETURN(const auto ftp, loadFtpFile());
     VELT_ASSIGN_OR_RETURN(auto confinement, prepareConfinement(confined));
-    std::string text =
-        renderSshd(settings, {ftp.umask, ftp.fipsOnly},
-                   {keys.files, keysProgram, user, geteuid() == 0, network.loopbackOnly, confinement.root});
+    std::string text = renderSshd(settings, {ftp.umask, ftp.fipsOnly},
+                                  {keys.files, keysProgram, statePath("/"), user, geteuid() == 0,
+                                   network.loopbackOnly, confinement.root});
     return Rendering{std::move(text), std::move(keys), std::move(confinement.environment)};
 }
 

@@ -1,7 +1,10 @@
 // The programs of a login while one system call after another fails: whoever they let in sees what he should
 // or less, and gets in with his own keys alone.
+#include "base/ask_child.h"
 #include "standalone/core/state_root.h"
+#include "standalone/keys/key_store.h"
 #include "standalone/rules/rule_store.h"
+#include "tests/standalone/support/example_keys.h"
 #include "tests/standalone/support/store_shares.h"
 #include "tests/support/fault_sweep.h"
 #include "tests/support/result.h"
@@ -18,6 +21,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <fstream>
 #include <set>
 
 namespace velt::test {
@@ -152,7 +156,7 @@ protected:
 
     /// The keys that the SFTP daemon is told, or "refused: " and what it may have been told before. Runs in a
     /// child.
-    std::string tellKeys() const {
+    std::string tellKeys(const std::vector<std::string>& further = {}) const {
         bool ready = hasOwnMounts();
         for (const char* file : {"passwd", "group", "nsswitch.conf"}) {
             const std::string own = root_.path() / "accounts" / file;
@@ -162,9 +166,25 @@ protected:
         if (!ready) {
             return "no mounts of its own";
         }
-        const auto ended = runProcess({VELT_AUTHORIZED_KEYS, "ann"});
-        return (ended.exitCode == 0 ? "" : "refused: ") + ended.output;
+        std::vector<std::string> words{VELT_AUTHORIZED_KEYS, "ann"};
+        words.insert(words.end(), further.begin(), further.end());
+        const auto ended = runProcess(words);
+        return (ended.exitCode == 0 ? "" : "refused: ") + ended.output +
+               (further.empty() || ended.errors.empty() ? "" : "log: " + ended.errors);
     }
+
+    void storeKey(const std::string& line, uid_t uid) const {
+        ASSERT_EQ(messageOf(storeKeyFile({"ann", uid, {{keyOf(line), "then", "root"}}})), "");
+    }
+    std::string tellAllKeys() const {
+        const auto asked = askChild([this] {
+            std::ofstream(root_.path() / "told") << tellKeys({root_.path()});
+            return 0;
+        });
+        return asked ? root_.read("told") : asked.error().message;
+    }
+    const std::string stored_ = "restrict " + aKey + "\n";
+    const std::string own_ = "ssh-rsa A\n";
 };
 
 TEST_F(KeyProgramFaults, TellTheKeysOfTheUserOrRefuse) {
@@ -178,6 +198,65 @@ TEST_F(KeyProgramFaults, TellTheKeysOfTheUserOrRefuse) {
         EXPECT_FALSE(contains(run.end.told, "ssh-rsa B")) << run.end.told;
     };
     EXPECT_GE(sweepFaults(sweep), 15);
+}
+
+TEST_F(KeyProgramFaults, TellTheStoredKeysOfTheAccountAndTheOwn) {
+    storeKey(aKey, ann);
+    FaultSweep sweep;
+    sweep.prepare = [] {};
+    sweep.act = [this] { return tellKeys({root_.path()}); };
+    sweep.counts = callsOf("velt-authorized-keys");
+    sweep.check = [this](const SweptRun& run) {
+        const std::string& told = run.end.told;
+        const std::string keys = told.substr(0, told.find("log: "));
+        const bool isPart = keys == stored_ || keys == own_ || keys.starts_with("refused: ");
+        EXPECT_TRUE(told == stored_ + own_ || (isPart && !run.call.name.empty())) << told;
+    };
+    EXPECT_GE(sweepFaults(sweep), 20);
+}
+
+TEST_F(KeyProgramFaults, TellNoKeyOfAFormerAccount) {
+    storeKey(aKey, ann + 1);
+    FaultSweep sweep;
+    sweep.prepare = [] {};
+    sweep.act = [this] { return tellKeys({root_.path()}); };
+    sweep.counts = callsOf("velt-authorized-keys");
+    sweep.check = [this](const SweptRun& run) { EXPECT_FALSE(contains(run.end.told, aKey)) << run.end.told; };
+    EXPECT_GE(sweepFaults(sweep), 20);
+    EXPECT_EQ(tellAllKeys(), own_);
+}
+
+using KeyProgram = KeyProgramFaults;
+
+TEST_F(KeyProgram, TellsTheOwnKeysAndWhyThereAreNoOthers) {
+    root_.write("etc/velt/keys/ann", "{");
+    const std::string damaged = tellAllKeys();
+    EXPECT_TRUE(damaged.starts_with(own_ + "log: ")) << damaged;
+    EXPECT_TRUE(contains(damaged, "keys of ann: The file of the keys of ann, ")) << damaged;
+    storeKey(aKey, ann);
+    chmod((root_.path() / "etc/velt/keys/ann").c_str(), 0622);
+    const std::string untrusted = tellAllKeys();
+    EXPECT_TRUE(untrusted.starts_with(own_ + "log: ")) << untrusted;
+    EXPECT_TRUE(contains(untrusted, "other accounts may write to it")) << untrusted;
+}
+
+TEST_F(KeyProgram, TellsTheStoredKeysAndWhyThereAreNoOthers) {
+    storeKey(aKey, ann);
+    chmod((root_.path() / "home/.ssh").c_str(), 0777);
+    const std::string told = tellAllKeys();
+    EXPECT_TRUE(told.starts_with(stored_ + "log: ")) << told;
+    EXPECT_TRUE(contains(told, "can be written by other users")) << told;
+    fs::remove_all(root_.path() / "home/.ssh");
+    EXPECT_EQ(tellAllKeys(), stored_);
+    fs::remove(root_.path() / "etc/velt/keys/ann");
+    EXPECT_EQ(tellAllKeys(), "");
+}
+
+TEST_F(KeyProgram, ReadsTheStoredKeysAsRootAlone) {
+    storeKey(aKey, ann);
+    ASSERT_EQ(chown((root_.path() / "etc/velt/keys/ann").c_str(), ann, ann), 0);
+    const std::string told = tellAllKeys();
+    EXPECT_TRUE(told.starts_with(own_ + "log: ")) << "the user could have written it: " << told;
 }
 
 TEST_F(KeyProgramFaults, ReadNothingThatTheUserMayNotRead) {

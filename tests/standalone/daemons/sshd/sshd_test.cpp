@@ -16,6 +16,7 @@ namespace {
 
 const SshdPlaces examplePlaces{{"/var/lib/velt/ssh/host_ed25519_key", "/var/lib/velt/ssh/host_rsa_key"},
                                "/usr/libexec/velt/velt-authorized-keys",
+                               "/",
                                "root",
                                true};
 
