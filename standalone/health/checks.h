@@ -57,6 +57,9 @@ Findings confinementFindings();
 /// The files of the shares and of the chroot rules, and the accounts that they name.
 Findings fileFindings();
 
+/// Files of users' public keys that cannot be used, and keys of accounts that are gone.
+Findings keyFindings();
+
 /// Chroot rules for folders of shares that do not exist.
 Findings ruleShareFindings();
 

@@ -21,7 +21,7 @@ struct Finding {
     std::string id; ///< stable, for programs: "certificate-key-mismatch"
     Severity severity = Severity::notice;
     std::string subject;  ///< what it is about: "ftp", "sftp", "settings", "firewall", "shares", "chroot",
-                          ///< "log", "sessions", "host"
+                          ///< "keys", "log", "sessions", "host"
     std::string sentence; ///< for people
     std::string mend;     ///< the command that mends it, or what to do before that command
 

@@ -53,6 +53,7 @@ Findings judgeHealth() {
         Check{[] { return certificateFindings(std::chrono::system_clock::now()); }},
         Check{fileFindings},
         Check{ruleShareFindings},
+        Check{keyFindings},
         Check{anonymousFindings},
         Check{confinementFindings},
         Check{firewallFindings},
