@@ -50,6 +50,9 @@
 // Who is refused for a while after too many failed logins.
 #include "standalone/bans/login_guard.h"
 
+// The public keys with which users log in over SFTP.
+#include "standalone/keys/stored_keys.h"
+
 // The calling thread's last error in a sentence.
 #include "standalone/contract/last_error.h"
 

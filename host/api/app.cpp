@@ -10,6 +10,7 @@
 #include "host/api/tokens.h"
 #include "host/api/transfers.h"
 #include "host/api/user_access.h"
+#include "host/api/user_keys.h"
 #include "host/base/percent_encoding.h"
 #include "host/base/random_text.h"
 
@@ -116,6 +117,7 @@ void App::addRoutes(const ModuleTable& table) {
     add(accessRoutes());
     add(banRoutes(log_));
     add(sessionRoutes(log_));
+    add(keyRoutes(log_));
     add(tokenRoutes(tokens_, events_, log_));
     add(healthRoutes(health_));
     add({logRoute(), transferRoute(), metricsRoute(metrics_, table, events_, health_), openApiRoute(openApi_),

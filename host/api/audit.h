@@ -22,6 +22,8 @@ enum class AuditEvent : unsigned {
     takenBackInPart = 0x11BF0009,
     superseded = 0x11BF000A,
     sessionEnded = 0x11BF000B,
+    keyAdded = 0x11BF0020,
+    keyRemoved = 0x11BF0021,
 };
 
 struct AuditEntry {

@@ -8,7 +8,7 @@ namespace velt {
 
 namespace {
 
-constexpr std::array<CatalogueEntry, 38> entries{{
+constexpr std::array<CatalogueEntry, 40> entries{{
     {0x11B00002, "The FTP service was enabled."},
     {0x11B00006, "The FTP service was disabled."},
     {0x11B00008, "The FTP upload limit was changed from %1 to %2."},
@@ -53,6 +53,8 @@ constexpr std::array<CatalogueEntry, 38> entries{{
     {0x11BF0014, "The %1 service is on, but could not be started: %2."},
     {0x11BF0015, "The administrator log begins here: its former file was moved away or deleted."},
     {0x11BF0016, "A login of \"%2\" over %1 was refused: %3."},
+    {0x11BF0020, "The key %2 (%3) was added for \"%1\"."},
+    {0x11BF0021, "The key %2 (%3) of \"%1\" was removed."},
 }};
 
 std::string unknownSentence(std::uint32_t event, const std::array<std::string, 4>& texts) {

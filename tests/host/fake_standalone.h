@@ -54,6 +54,8 @@ struct FakeStandalone {
     std::function<void()> whileNoted;      ///< called for each of them before
     std::string accessReport;              ///< unless `error` is set
     std::string askedAccess;               ///< "USER PATH", the last one
+    std::vector<velt::StoredKey> keys;
+    bool keysFail = false; ///< with `error` and `sentence`
     std::vector<velt::OpenSession> openSessions;
     bool sessionsFail = false;                     ///< they cannot be listed: with `sentence`
     std::vector<std::string> immortal;             ///< the ids of those that cannot be ended: with `sentence`

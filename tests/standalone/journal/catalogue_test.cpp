@@ -21,7 +21,7 @@ TEST(Catalogue, KnowsEveryEventOnce) {
                           0x11B00025, 0x11B00026, 0x11B00027, 0x11B00028, 0x11B00035, 0x11B00036, 0x11BF0001,
                           0x11BF0002, 0x11BF0003, 0x11BF0004, 0x11BF0005, 0x11BF0006, 0x11BF0007, 0x11BF0008,
                           0x11BF0009, 0x11BF000A, 0x11BF000B, 0x11BF0010, 0x11BF0011, 0x11BF0012, 0x11BF0013,
-                          0x11BF0014, 0x11BF0015, 0x11BF0016}));
+                          0x11BF0014, 0x11BF0015, 0x11BF0016, 0x11BF0020, 0x11BF0021}));
     EXPECT_EQ(events.size(), catalogue().size());
 }
 
