@@ -46,6 +46,7 @@ void addAccessCommand(CLI::App& app, Command& chosen);
 void addSessionCommands(CLI::App& app, Command& chosen);
 void addTransfersCommand(CLI::App& app, Command& chosen);
 void addBanCommands(CLI::App& app, Command& chosen);
+void addKeyCommands(CLI::App& app, Command& chosen);
 void addTokenCommands(CLI::App& app, Command& chosen);
 void addDocumentCommands(CLI::App& app, Command& chosen);
 void addCallCommand(CLI::App& app, Command& chosen);

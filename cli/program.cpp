@@ -92,6 +92,7 @@ void addCommands(CLI::App& app, GlobalOptions& options, Command& chosen) {
     addSessionCommands(app, chosen);
     addTransfersCommand(app, chosen);
     addBanCommands(app, chosen);
+    addKeyCommands(app, chosen);
     addTokenCommands(app, chosen);
     addDocumentCommands(app, chosen);
     addCallCommand(app, chosen);

@@ -105,6 +105,9 @@ std::string absenceHint(const std::string& path) {
     if (path.starts_with("/api/bans/")) {
         return "'veltctl bans list' lists the bans.";
     }
+    if (path.starts_with("/api/keys")) {
+        return "'veltctl keys list' lists the keys.";
+    }
     if (path.starts_with("/api/sessions/")) {
         return "'veltctl sessions' lists the sessions.";
     }

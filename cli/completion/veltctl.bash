@@ -5,7 +5,7 @@ _veltctl_words() {
     local ftp='enable_ftp= enable_ftps= timeout= portnum= custom_port_range= custom_port= use_ext_ip= ext_ip= enable_fxp=
         enable_ascii= enable_fips= enable_flow_ctrl= maxuploadrate= maxdownloadrate= max_conn_per_ip='
     case $1 in
-        '') echo 'status doctor restart log events ftp security sftp confinement shares chroot history diff undo confirm access sessions kick transfers bans tokens export import call' ;;
+        '') echo 'status doctor restart log events ftp security sftp confinement shares chroot history diff undo confirm access sessions kick transfers bans keys tokens export import call' ;;
         ftp | security | sftp | confinement) echo 'get set' ;;
         'ftp set') echo "$ftp utf8_mode=" ;;
         'security set') echo 'user_chroot= anonymous= anonymous_chroot= anonymous_chroot_share= enable_umask=' ;;
@@ -17,6 +17,7 @@ _veltctl_words() {
         'chroot rules') echo 'load save add remove' ;;
         'chroot rules add' | 'chroot rules remove') echo 'user group' ;;
         bans) echo 'list lift' ;;
+        keys) echo 'list add remove import' ;;
         tokens) echo 'list create delete' ;;
     esac
 }
@@ -37,7 +38,7 @@ _veltctl_options() {
             echo '--dry-run --keep-sessions --end-sessions --confirm-within' ;;
         history) echo '--before --limit' ;;
         restart) echo '--dry-run --end-sessions' ;;
-        confirm | 'bans lift' | 'tokens delete') echo '--dry-run' ;;
+        confirm | 'bans lift' | 'keys add' | 'keys remove' | 'keys import' | 'tokens delete') echo '--dry-run' ;;
         'chroot users list') echo '--others --offset --limit --type --domain --filter' ;;
         'tokens create') echo '--dry-run --role' ;;
         export) echo '--output' ;;
@@ -131,7 +132,7 @@ _veltctl() {
         return
     fi
     case $command in
-        import | diff | 'chroot rules save') _veltctl_files "$current" ;;
+        import | diff | 'chroot rules save' | 'keys add' | 'keys import') _veltctl_files "$current" ;;
         *) COMPREPLY=($(compgen -W "$(_veltctl_words "$command")" -- "$current")) ;;
     esac
     [[ ${COMPREPLY[*]:-} != *= ]] || compopt -o nospace 2>/dev/null
