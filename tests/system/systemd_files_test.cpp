@@ -83,6 +83,7 @@ echo '{"version": 1, "shares": [{"name": "public", "comment": "", "path": "/srv/
 ./veltctl security set anonymous=on anonymous_chroot=on anonymous_chroot_share=public
 ./veltctl sftp set enable=on portnum=2222
 ./veltctl chroot rules add user alice /home
+./veltctl keys add alice ssh-ed25519 AAAAC3NzaC1lZDI1NTE5AAAAIG6o8kw9HXo7MMRTNqpwImZIpCtgXHP+yTaiesMotiqn
 ./veltctl tokens create watcher --role viewer
 curl -sS ftp://127.0.0.1/)"},
                                                  {}, std::chrono::seconds(60));
