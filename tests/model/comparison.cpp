@@ -103,11 +103,19 @@ std::string disagreement(const Tree& before, const Expectation& expected, const 
     });
 }
 
-std::string breach(const Tree& before, const View& view, const Outcome& outcome) {
+std::string breach(const Tree& before, const View& view, std::uint64_t open, const Outcome& outcome) {
+    // By any of its names; what is open stays open.
+    const auto may = [&](const Tree& tree, const std::string& path, Access access) {
+        const Node* const node = tree.at(path);
+        return (open != 0 && node != nullptr && node->id == open) ||
+               std::ranges::any_of(tree.namesOf(path), [&](const std::string& name) {
+                   return mayReach(tree, view, name, access);
+               });
+    };
     if (outcome.content && !outcome.content->empty()) {
         const bool known = std::ranges::any_of(before.nodes, [&](const auto& entry) {
             return entry.second.kind == Kind::file && entry.second.text == *outcome.content &&
-                   mayReach(before, view, entry.first, Access::read);
+                   may(before, entry.first, Access::read);
         });
         if (!known) {
             return "BREACH: read \"" + *outcome.content + "\"";
@@ -115,8 +123,7 @@ std::string breach(const Tree& before, const View& view, const Outcome& outcome)
     }
     return eachDifference(before, outcome.after, [&](const std::string& path) -> std::string {
         const bool wasThere = before.at(path) != nullptr;
-        const bool mayChange = mayReach(wasThere ? before : outcome.after, view, path, Access::write);
-        return mayChange ? "" : "BREACH: changed " + path;
+        return may(wasThere ? before : outcome.after, path, Access::write) ? "" : "BREACH: changed " + path;
     });
 }
 

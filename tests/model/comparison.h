@@ -18,8 +18,8 @@ struct Outcome {
 std::string disagreement(const Tree& before, const Expectation& expected, const Outcome& outcome);
 
 /// What was read or changed though nothing that the login was given leads there; "" when there is nothing.
-/// Holds whatever the model says of the step.
-std::string breach(const Tree& before, const View& view, const Outcome& outcome);
+/// Holds whatever the model says of the step. `open` is the number of a file that the session has open, or 0.
+std::string breach(const Tree& before, const View& view, std::uint64_t open, const Outcome& outcome);
 
 } // namespace velt::model
 

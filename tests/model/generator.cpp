@@ -7,7 +7,6 @@ namespace {
 
 const std::vector<std::string> users{"alice", "bob", "carol"};
 const std::vector<std::string> shareNames{"one", "two", "three", "four"};
-const std::vector<std::string> sessionNames{"s1", "s2", "s3", "s4"};
 
 bool isDeeper(const std::string& one, const std::string& other) {
     return std::ranges::count(one, '/') < std::ranges::count(other, '/');
@@ -178,25 +177,6 @@ std::string Generator::placeOfNote(const World& world) {
     return place;
 }
 
-std::string Generator::viewPath(const Runner& runner, const Session& session, bool folder) {
-    const Tree& tree = runner.world().tree;
-    if (chance(3)) {
-        return anyOf({"/", "/apart/secret", "/mnt/srv/apart/secret", "/..", "/one", "/mnt", "/f", "/a"});
-    }
-    for (int attempt = 0; attempt < 20 && !session.view.mounts.empty(); attempt++) {
-        const Mount& mount = oneOf(session.view.mounts);
-        const std::string root = tree.placeOf(mount.folder);
-        const std::string place = chance(35)             ? placeOfNote(runner.world())
-                                  : folder || chance(25) ? folderIn(tree)
-                                                         : placeIn(tree);
-        if (mount.parent < 0 && !root.empty() && isWithin(place, root)) {
-            const std::string path = (mount.name.empty() ? "" : "/" + mount.name) + place.substr(root.size());
-            return path.empty() ? "/" : path;
-        }
-    }
-    return "/";
-}
-
 Step Generator::administer(const Runner& runner) {
     const Tree& tree = runner.world().tree;
     const int what = below(10);
@@ -227,8 +207,10 @@ Step Generator::inShell(const Runner& runner) {
     case 1:
         return {"shell", user, "mkdir", fresh};
     case 2:
-    case 3:
         return {"shell", user, "ln", target(), fresh};
+    case 3:
+        return chance(70) ? Step{"shell", user, "ln", target(), fresh}
+                          : Step{"shell", user, "twin", place, fresh};
     case 4:
     case 5:
     case 6:
@@ -239,69 +221,6 @@ Step Generator::inShell(const Runner& runner) {
         return {"shell", user, "rmdir", place};
     default:
         return chance(50) ? Step{"shell", user, "write", fresh} : Step{"shell", user, "chmod", mode(), place};
-    }
-}
-
-Step Generator::logIn(const std::string& session) {
-    return {"login", session, anyOf({"alice", "alice", "alice", "bob", "bob", "carol", "ftp"})};
-}
-
-// The path of what is mounted in another mount, as an attacker would try to get rid of it; "" when nothing
-// is.
-std::string Generator::mountedPath(const Runner& runner, const View& view) {
-    std::vector<const Mount*> inner;
-    for (const Mount& mount : view.mounts) {
-        if (mount.parent >= 0) {
-            inner.push_back(&mount);
-        }
-    }
-    if (inner.empty()) {
-        return "";
-    }
-    const Mount* outer = oneOf(inner);
-    const std::string place = runner.world().tree.placeOf(outer->folder);
-    while (outer->parent >= 0) {
-        outer = &view.mounts[static_cast<std::size_t>(outer->parent)];
-    }
-    const std::string root = runner.world().tree.placeOf(outer->folder);
-    const bool within = !root.empty() && isWithin(place, root);
-    return within ? (outer->name.empty() ? "" : "/" + outer->name) + place.substr(root.size()) : "";
-}
-
-Step Generator::ask(const Runner& runner) {
-    const auto& [name, session] = oneOf(runner.sessions());
-    const std::string mounted = chance(15) ? mountedPath(runner, session.view) : "";
-    if (!mounted.empty()) {
-        return chance(80) ? Step{"rename", name, mounted, join(parentOf(mounted), this->name())}
-                          : Step{"remove-folder", name, mounted};
-    }
-    const std::string path = viewPath(runner, session, false);
-    const std::string around = viewPath(runner, session, true);
-    const std::string fresh = join(around, chance(5) ? anyOf({".ssh", ".profile"}) : this->name());
-    switch (below(16)) {
-    case 0:
-        return {"enter", name, path};
-    case 1:
-    case 2:
-        return {anyOf({"list", "names", "facts"}), name, path};
-    case 3:
-    case 4:
-    case 5:
-        return {"read", name, path};
-    case 6:
-    case 7:
-        return {anyOf({"write", "append"}), name, chance(50) ? path : fresh};
-    case 8:
-    case 9:
-        return {"make", name, fresh};
-    case 10:
-        return {"remove-folder", name, around};
-    case 11:
-        return {"remove", name, path};
-    case 12:
-        return {"chmod", name, path, mode()};
-    default:
-        return {"rename", name, chance(50) ? path : around, fresh};
     }
 }
 
@@ -336,7 +255,7 @@ void Generator::attack(const Runner& runner) {
     if (chance(60)) {
         putInTheWay(runner, way);
     }
-    const std::string session = oneOf(sessionNames);
+    const std::string session = sessionName();
     planned_.push_back(logIn(session));
     lookAround(session, shares);
 }
@@ -352,7 +271,7 @@ Step Generator::next(const Runner& runner) {
     }
     const int what = below(100);
     if (what < 9 || runner.sessions().empty()) {
-        return what < 80 ? logIn(oneOf(sessionNames)) : administer(runner);
+        return what < 80 ? logIn(sessionName()) : administer(runner);
     }
     if (what < 13) {
         return administer(runner);

@@ -11,7 +11,8 @@ namespace velt::model {
 
 class Generator {
 public:
-    explicit Generator(std::uint64_t seed) : random_(seed) {}
+    /// So many of a hundred logins of those who may are over SFTP.
+    Generator(std::uint64_t seed, int overSftp) : random_(seed), overSftp_(overSftp) {}
 
     /// The administrator's first steps in an empty world.
     Steps world();
@@ -49,12 +50,15 @@ private:
     Step administer(const Runner& runner);
     Step inShell(const Runner& runner);
     Step ask(const Runner& runner);
+    Step askOverSftp(const Runner& runner, const std::string& name, const Session& session);
+    std::string sessionName();
     Step logIn(const std::string& session);
     void attack(const Runner& runner);
     void putInTheWay(const Runner& runner, const std::string& way);
     void lookAround(const std::string& session, const std::vector<Share>& shares);
 
     std::mt19937_64 random_;
+    int overSftp_;
     std::vector<std::string> folders_; ///< of the world that is being made
     std::deque<Step> planned_;
 };

@@ -3,7 +3,9 @@
 #include "ftp/ftp_library.h"
 #include "standalone/core/state_root.h"
 #include "standalone/daemons/proftpd/proftpd_plan.h"
-#include "tests/model/ftp_client.h"
+#include "standalone/daemons/sshd/sshd_plan.h"
+#include "standalone/settings/confinement_settings.h"
+#include "standalone/settings/settings_store.h"
 #include "tests/support/files.h"
 #include "tests/system/support/files.h"
 
@@ -99,6 +101,8 @@ void doInShell(const Step& step, const std::string& data) {
         mkdir(path.c_str(), 0777);
     } else if (what == "ln") {
         (void)!symlink(path.c_str(), step.at(4).c_str());
+    } else if (what == "twin") {
+        (void)link(path.c_str(), step.at(4).c_str());
     } else if (what == "mv") {
         (void)rename(path.c_str(), step.at(4).c_str());
     } else if (what == "rm") {
@@ -117,6 +121,37 @@ bool become(const Account& account) {
     return setgroups(groups.size(), groups.data()) == 0 && setgid(groups[0]) == 0 && setuid(account.uid) == 0;
 }
 
+void storeSettings(const Switches& switches, int port) {
+    _tag_VELT_FTP_CONF_ record{};
+    if (VELTFTPConfGet(&record) != 0) {
+        throw std::runtime_error("no settings");
+    }
+    std::snprintf(record.portnum, sizeof record.portnum, "%d", port);
+    record.service_flags = VELT_FTP_SERVICE_PLAIN;
+    record.user_chroot = switches.confined ? 1 : 0;
+    record.anonymous = switches.anonymous ? 1 : 0;
+    record.anonymous_chroot = switches.guestsShare.empty() ? 0 : 1;
+    std::snprintf(record.anonymous_chroot_share, sizeof record.anonymous_chroot_share, "%s",
+                  switches.guestsShare.c_str());
+    if (VELTFTPConfSet(record) != 0) {
+        throw std::runtime_error("the settings are refused");
+    }
+}
+
+/// In the state root of now. `other` has one whose keys may be there.
+Result<std::optional<DaemonPlan>> planSftp(int port, const std::string& other) {
+    const char* const keys = "/var/lib/velt/ssh";
+    // To make keys takes a while, and they tell nothing here.
+    const fs::path own = statePath(keys);
+    if (fs::exists(other + keys) && !fs::exists(own)) {
+        fs::create_directories(own.parent_path());
+        fs::copy(other + keys, own, fs::copy_options::recursive);
+    }
+    VELT_RETURN_IF_ERROR(storeConfinementSettings({true}));
+    VELT_RETURN_IF_ERROR(storeSftpSettings({true, port}));
+    return planSftpDaemon();
+}
+
 } // namespace
 
 const std::vector<Switches>& possibleSwitches() {
@@ -127,15 +162,10 @@ const std::vector<Switches>& possibleSwitches() {
 
 RealWorld::RealWorld() {
     umask(0);
-    for (int turn = 0; turn < turns; turn++) {
-        for (const Switches& switches : possibleSwitches()) {
-            const int number = static_cast<int>(servers_.size());
-            Server& server = servers_.emplace_back();
-            server.switches = switches;
-            server.turn = turn;
-            server.port = firstPort + number;
-            server.stateRoot = "/mnt/root/" + std::to_string(number);
-            start(server);
+    for (const Switches& switches : possibleSwitches()) {
+        add(switches, test::Protocol::sftp, -1);
+        for (int turn = 0; turn < turns; turn++) {
+            add(switches, test::Protocol::ftp, turn);
         }
     }
 }
@@ -149,24 +179,19 @@ RealWorld::~RealWorld() {
     }
 }
 
-void RealWorld::start(Server& server) const {
+void RealWorld::add(const Switches& switches, test::Protocol protocol, int turn) {
+    const int number = static_cast<int>(servers_.size());
+    Server& server = servers_.emplace_back();
+    server.switches = switches;
+    server.protocol = protocol;
+    server.turn = turn;
+    server.port = firstPort + number;
+    server.stateRoot = "/mnt/root/" + std::to_string(number);
     fs::create_directories(server.stateRoot);
     setStateRoot(server.stateRoot);
-    _tag_VELT_FTP_CONF_ record{};
-    if (VELTFTPConfGet(&record) != 0) {
-        throw std::runtime_error("no settings");
-    }
-    std::snprintf(record.portnum, sizeof record.portnum, "%d", server.port);
-    record.service_flags = VELT_FTP_SERVICE_PLAIN;
-    record.user_chroot = server.switches.confined ? 1 : 0;
-    record.anonymous = server.switches.anonymous ? 1 : 0;
-    record.anonymous_chroot = server.switches.guestsShare.empty() ? 0 : 1;
-    std::snprintf(record.anonymous_chroot_share, sizeof record.anonymous_chroot_share, "%s",
-                  server.switches.guestsShare.c_str());
-    if (VELTFTPConfSet(record) != 0) {
-        throw std::runtime_error("the settings are refused");
-    }
-    const auto plan = planFtpDaemon();
+    storeSettings(switches, server.port);
+    const auto plan =
+        protocol == test::Protocol::ftp ? planFtpDaemon() : planSftp(server.port, servers_.front().stateRoot);
     if (!plan || !*plan || !server.daemon.start((*plan)->order)) {
         throw std::runtime_error("no daemon: " + (plan ? "it did not start" : plan.error().message));
     }
@@ -223,7 +248,7 @@ void RealWorld::layDown(const Step& step, const std::string& data) const {
 }
 
 void RealWorld::inShell(const Step& step, const std::string& data) const {
-    static const std::set<std::string> known{"mkdir", "ln", "mv", "rm", "rmdir", "chmod", "write"};
+    static const std::set<std::string> known{"mkdir", "ln", "twin", "mv", "rm", "rmdir", "chmod", "write"};
     if (!known.contains(step.at(2)) || step.size() < 4) {
         throw std::invalid_argument("a shell knows nothing like " + formatStep(step));
     }
@@ -240,7 +265,7 @@ void RealWorld::inShell(const Step& step, const std::string& data) const {
 
 void RealWorld::storeFile(const std::string& name, const std::string& text) const {
     for (const Server& server : servers_) {
-        if (server.turn == turn_) {
+        if (isServing(server)) {
             const std::string path = server.stateRoot + "/etc/velt/" + name;
             test::writeFile(path, text);
             chmod(path.c_str(), 0600);
@@ -260,16 +285,17 @@ void RealWorld::storeRules(const std::vector<Rule>& rules) const {
     storeFile("chroot_rules", text);
 }
 
-std::unique_ptr<Client> RealWorld::logIn(const Switches& switches, const Account& account) const {
+std::unique_ptr<test::FileClient> RealWorld::logIn(const Switches& switches, const Account& account,
+                                                   test::Protocol protocol) const {
     const auto server = std::ranges::find_if(servers_, [&](const Server& one) {
-        return one.turn == turn_ && one.switches.confined == switches.confined &&
+        return isServing(one) && one.protocol == protocol && one.switches.confined == switches.confined &&
                one.switches.anonymous == switches.anonymous &&
                one.switches.guestsShare == switches.guestsShare;
     });
     if (server == servers_.end()) {
         throw std::invalid_argument("no daemon runs with these switches");
     }
-    return logInByFtp(server->port, account);
+    return test::logInBy(protocol, server->port, account.name);
 }
 
 } // namespace velt::model

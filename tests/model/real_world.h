@@ -3,10 +3,10 @@
 #ifndef VELT_TESTS_MODEL_REAL_WORLD_H
 #define VELT_TESTS_MODEL_REAL_WORLD_H
 
-#include "tests/model/client.h"
 #include "tests/model/policy.h"
 #include "tests/model/step.h"
 #include "tests/system/support/daemon_process.h"
+#include "tests/system/support/file_client.h"
 
 #include <list>
 
@@ -34,18 +34,22 @@ public:
     void storeRules(const std::vector<Rule>& rules) const;
 
     /// At a daemon that runs with these switches, which are among `possibleSwitches`.
-    std::unique_ptr<Client> logIn(const Switches& switches, const Account& account) const;
+    std::unique_ptr<test::FileClient> logIn(const Switches& switches, const Account& account,
+                                            test::Protocol protocol) const;
 
 private:
     struct Server {
         Switches switches;
-        int turn = 0;
+        test::Protocol protocol = test::Protocol::ftp;
+        int turn = 0; ///< -1: it serves in all
         int port = 0;
         std::string stateRoot;
         test::DaemonProcess daemon;
     };
 
-    void start(Server& server) const;
+    void add(const Switches& switches, test::Protocol protocol, int turn);
+    bool isServing(const Server& server) const { return server.turn == turn_ || server.turn < 0; }
+
     void storeFile(const std::string& name, const std::string& text) const;
 
     std::list<Server> servers_;

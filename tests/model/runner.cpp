@@ -1,9 +1,6 @@
 #include "tests/model/runner.h"
 
-#include "tests/model/comparison.h"
-
 #include <algorithm>
-#include <exception>
 #include <stdexcept>
 
 namespace velt::model {
@@ -13,35 +10,51 @@ Access accessNamed(const std::string& word) {
     return word == "write" ? Access::write : word == "read" ? Access::read : Access::none;
 }
 
-Listing listingNamed(const std::string& verb) {
+test::Listing listingNamed(const std::string& verb) {
+    using test::Listing;
     return verb == "list" ? Listing::list : verb == "names" ? Listing::names : Listing::facts;
 }
 
-bool isAsked(const std::string& verb) {
-    static const std::set<std::string> verbs{"enter",  "list", "names",  "facts",         "read",   "write",
-                                             "append", "make", "remove", "remove-folder", "rename", "chmod"};
-    return verbs.contains(verb);
+unsigned modeIn(const std::string& word) {
+    return static_cast<unsigned>(std::stoul(word, nullptr, 8));
 }
 
-Outcome doStep(Client& client, const Step& step, const std::string& data) {
+constexpr std::uint32_t longAgo = 1000000000;
+
+bool isDone(test::FileClient& client, const Step& step, const std::string& data) {
+    using Opening = test::FileClient::Opening;
     const std::string& verb = step[0];
-    const std::string& path = step.at(2);
+    const std::string& path = step.at(1 + std::min<std::size_t>(step.size() - 2, 1));
+    return verb == "enter"           ? client.enter(path)
+           : verb == "write"         ? client.write(path, data)
+           : verb == "append"        ? client.append(path, data)
+           : verb == "make"          ? client.makeFolder(path)
+           : verb == "remove"        ? client.remove(path)
+           : verb == "remove-folder" ? client.removeFolder(path)
+           : verb == "rename"        ? client.rename(path, step.at(3))
+           : verb == "replace"       ? client.replace(path, step.at(3))
+           : verb == "twin"          ? client.hardLink(path, step.at(3))
+           : verb == "symlink"       ? client.symbolicLink(step.at(3), path)
+           : verb == "cut"           ? client.cut(path)
+           : verb == "times"         ? client.setTimes(path, longAgo)
+           : verb == "open-to-read"  ? client.open(path, Opening::toRead)
+           : verb == "open-to-write" ? client.open(path, Opening::toWrite)
+           : verb == "write-open"    ? client.writeOpen(data)
+           : verb == "chmod-open"    ? client.setModeOfOpen(modeIn(path))
+                                     : client.setMode(path, modeIn(step.at(3)));
+}
+
+Outcome doStep(test::FileClient& client, const Step& step, const std::string& data) {
+    const std::string& verb = step[0];
     Outcome outcome;
     if (verb == "list" || verb == "names" || verb == "facts") {
-        outcome.names = client.list(path, listingNamed(verb));
+        outcome.names = client.list(step.at(2), listingNamed(verb));
         outcome.allowed = outcome.names.has_value();
-    } else if (verb == "read") {
-        outcome.content = client.read(path);
+    } else if (verb == "read" || verb == "read-open") {
+        outcome.content = verb == "read" ? client.read(step.at(2)) : client.readOpen();
         outcome.allowed = outcome.content.has_value();
     } else {
-        outcome.allowed = verb == "enter"           ? client.enter(path)
-                          : verb == "write"         ? client.write(path, data)
-                          : verb == "append"        ? client.append(path, data)
-                          : verb == "make"          ? client.make(path)
-                          : verb == "remove"        ? client.remove(path)
-                          : verb == "remove-folder" ? client.removeFolder(path)
-                          : verb == "rename"        ? client.rename(path, step.at(3))
-                                                    : client.changeMode(path, step.at(3));
+        outcome.allowed = isDone(client, step, data);
     }
     return outcome;
 }
@@ -67,7 +80,7 @@ std::string Runner::perform(const Step& step) {
         logOut(step.at(1));
         return "";
     }
-    if (!isAsked(verb)) {
+    if (!isAsked(step)) {
         administer(step);
         return "";
     }
@@ -129,15 +142,17 @@ void Runner::setRules(const Step& step) {
 
 std::string Runner::logIn(const Step& step) {
     const Account& account = accountOf(step.at(2));
+    const Protocol protocol = step.size() > 3 && step[3] == "sftp" ? Protocol::sftp : Protocol::ftp;
     counts_.logins++;
     logOut(step[1]);
     auto view = viewOf(world_, account);
-    auto client = real_.logIn(world_.switches, account);
+    auto client = real_.logIn(world_.switches, account, protocol);
     if (view.has_value() != client->isLoggedIn()) {
         return view ? "was refused, and must be allowed" : "was allowed, and must be refused";
     }
     if (view) {
-        sessions_.emplace(step[1], Session{account, std::move(*view), world_.changes, std::move(client)});
+        sessions_.emplace(
+            step[1], Session{account, std::move(*view), world_.changes, protocol, std::move(client), {}});
     } else {
         ended_.push_back(std::move(client));
     }
@@ -152,28 +167,41 @@ void Runner::logOut(const std::string& session) {
 }
 
 std::string Runner::ask(const Step& step, Session& session) {
+    if (isOfOpenFile(step) && (!session.opened || world_.tree.placeOf(session.opened->file).empty())) {
+        return "";
+    }
     const std::string data = "#" + std::to_string(++written_) + ";";
     const bool mayEnd = session.changes != world_.changes && changesNames(step);
-    const Expectation expected =
-        mayEnd ? Expectation() : expect(world_.tree, session.view, session.account, step, data);
-    Outcome outcome;
-    try {
-        outcome = doStep(*session.client, step, data);
-    } catch (const std::exception& error) {
-        return error.what();
-    }
+    const Asker asker{session.account, session.view, session.protocol, session.opened};
+    const Expectation expected = mayEnd ? Expectation() : expect(world_.tree, asker, step, data);
+    Outcome outcome = doStep(*session.client, step, data);
     outcome.after = real_.look();
     counts_.asked++;
+    counts_.overSftp += session.protocol == Protocol::sftp ? 1 : 0;
     counts_.decided += expected.verdict != Verdict::undecided ? 1 : 0;
     counts_.allowed += outcome.allowed ? 1 : 0;
-    std::string what = breach(world_.tree, session.view, outcome);
-    if (what.empty()) {
-        what = disagreement(world_.tree, expected, outcome);
-    }
+    std::string what = compare(step, session, expected, outcome);
     world_.tree = std::move(outcome.after);
     if (session.client->hasEnded()) {
         what = mayEnd || !what.empty() ? what : "ended the session";
         logOut(step[1]);
+    }
+    return what;
+}
+
+std::string Runner::compare(const Step& step, Session& session, const Expectation& expected,
+                            Outcome& outcome) {
+    const std::uint64_t open = isOfOpenFile(step) ? session.opened->file : 0;
+    std::string what = breach(world_.tree, session.view, open, outcome);
+    if (what.empty()) {
+        what = disagreement(world_.tree, expected, outcome);
+    }
+    if (step[0].starts_with("open-to-")) {
+        session.opened = outcome.allowed ? expected.opened : std::nullopt;
+        if (session.opened && session.opened->file == 0) {
+            const Node* made = outcome.after.at(session.opened->place);
+            session.opened->file = made != nullptr ? made->id : 0;
+        }
     }
     return what;
 }

@@ -2,7 +2,7 @@
 #ifndef VELT_TESTS_MODEL_RUNNER_H
 #define VELT_TESTS_MODEL_RUNNER_H
 
-#include "tests/model/expectation.h"
+#include "tests/model/comparison.h"
 #include "tests/model/real_world.h"
 
 namespace velt::model {
@@ -11,14 +11,17 @@ struct Session {
     Account account;
     View view;
     long changes = 0; ///< of the world, at the login
-    std::unique_ptr<Client> client;
+    Protocol protocol = Protocol::ftp;
+    std::unique_ptr<test::FileClient> client;
+    std::optional<OpenFile> opened;
 };
 
 /// What a run was made of.
 struct Counts {
     long steps = 0;
     long logins = 0;
-    long asked = 0; ///< steps of sessions
+    long asked = 0;    ///< steps of sessions
+    long overSftp = 0; ///< of these
     long decided = 0;
     long allowed = 0;
 };
@@ -45,11 +48,12 @@ private:
     std::string logIn(const Step& step);
     void logOut(const std::string& session);
     std::string ask(const Step& step, Session& session);
+    std::string compare(const Step& step, Session& session, const Expectation& expected, Outcome& outcome);
 
     RealWorld& real_;
     World world_;
     std::map<std::string, Session> sessions_;
-    std::vector<std::unique_ptr<Client>> ended_; ///< see RealWorld::clear
+    std::vector<std::unique_ptr<test::FileClient>> ended_; ///< see RealWorld::clear
     Counts counts_;
     long written_ = 0; ///< no two files get the same content
 };

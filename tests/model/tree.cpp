@@ -74,6 +74,30 @@ std::string Tree::placeOf(std::uint64_t id) const {
     return "";
 }
 
+std::vector<std::string> Tree::namesOf(const std::string& file) const {
+    std::vector<std::string> names{file};
+    const Node* const node = at(file);
+    for (const auto& [path, other] : nodes) {
+        if (node != nullptr && node->id != 0 && node->kind != Kind::folder && other.id == node->id &&
+            path != file) {
+            names.push_back(path);
+        }
+    }
+    return names;
+}
+
+void Tree::setText(const std::string& file, const std::string& text) {
+    for (const std::string& name : namesOf(file)) {
+        nodes.at(name).text = text;
+    }
+}
+
+void Tree::setMode(const std::string& path, unsigned mode) {
+    for (const std::string& name : namesOf(path)) {
+        nodes.at(name).mode = mode;
+    }
+}
+
 std::set<std::string> Tree::namesIn(const std::string& folder) const {
     std::set<std::string> names;
     for (const auto& [path, node] : nodes) {

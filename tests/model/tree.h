@@ -53,6 +53,11 @@ struct Tree {
     bool isFolder(const std::string& path) const;
     /// Where the node is now; "" when it is gone.
     std::string placeOf(std::uint64_t id) const;
+    /// All names of the file at this place, its own first.
+    std::vector<std::string> namesOf(const std::string& file) const;
+    /// Whatever name it has.
+    void setText(const std::string& file, const std::string& text);
+    void setMode(const std::string& path, unsigned mode);
     std::set<std::string> namesIn(const std::string& folder) const;
     void move(const std::string& from, const std::string& to);
 };

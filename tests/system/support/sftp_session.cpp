@@ -2,6 +2,7 @@
 
 #include "base/file.h"
 #include "tests/support/waiting.h"
+#include "tests/system/support/sftp_packet.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -18,82 +19,10 @@
 #include <utility>
 
 namespace velt::test {
+
+using namespace packet;
+
 namespace {
-
-enum Kind {
-    kindInit = 1,
-    kindOpen = 3,
-    kindClose = 4,
-    kindRead = 5,
-    kindWrite = 6,
-    kindSet = 9,
-    kindSetOpen = 10,
-    kindOpenFolder = 11,
-    kindReadFolder = 12,
-    kindRemove = 13,
-    kindMakeFolder = 14,
-    kindRemoveFolder = 15,
-    kindRealPath = 16,
-    kindRename = 18,
-    kindTarget = 19,
-    kindSymbolicLink = 20,
-    kindStatus = 101,
-    kindHandle = 102,
-    kindData = 103,
-    kindName = 104,
-    kindExtended = 200,
-};
-
-enum Attribute : std::uint32_t {
-    hasSize = 1,
-    hasOwner = 2,
-    hasMode = 4,
-    hasTimes = 8
-};
-
-std::string number(std::uint32_t value) {
-    return {static_cast<char>(value >> 24), static_cast<char>(value >> 16), static_cast<char>(value >> 8),
-            static_cast<char>(value)};
-}
-
-std::string number64(std::uint64_t value) {
-    return number(static_cast<std::uint32_t>(value >> 32)) + number(static_cast<std::uint32_t>(value));
-}
-
-std::string text(const std::string& value) {
-    return number(static_cast<std::uint32_t>(value.size())) + value;
-}
-
-std::string modeAttribute(std::optional<std::uint32_t> mode) {
-    return mode ? number(hasMode) + number(*mode) : number(0);
-}
-
-std::string timesAttribute(std::uint32_t seconds) {
-    return number(hasTimes) + number(seconds) + number(seconds);
-}
-
-std::uint32_t takeNumber(std::string& body) {
-    std::uint32_t value = 0;
-    for (std::size_t i = 0; i < 4 && i < body.size(); i++) {
-        value = value << 8 | static_cast<unsigned char>(body[i]);
-    }
-    body.erase(0, 4);
-    return value;
-}
-
-std::string takeText(std::string& body) {
-    const std::size_t size = takeNumber(body);
-    std::string value = body.substr(0, size);
-    body.erase(0, size);
-    return value;
-}
-
-void skipAttributes(std::string& body) {
-    const std::uint32_t flags = takeNumber(body);
-    for (const auto& [flag, size] : {std::pair{hasSize, 8U}, {hasOwner, 8U}, {hasMode, 4U}, {hasTimes, 8U}}) {
-        body.erase(0, (flags & flag) != 0 ? size : 0U);
-    }
-}
 
 /// A program that tells the password which stands in its environment.
 const std::string& askProgram() {
@@ -261,21 +190,33 @@ int SftpSession::close(const std::string& handle) {
     return status(kindClose, text(handle));
 }
 
+std::optional<std::string> SftpSession::receiveOpen(const std::string& handle) {
+    std::string all;
+    for (;;) {
+        Packet answer = ask(kindRead, text(handle) + number64(all.size()) + number(32768));
+        if (answer.type != kindData) {
+            return statusOf(answer) == 1 ? std::optional(all) : std::nullopt;
+        }
+        all += takeText(answer.body);
+    }
+}
+
 std::optional<std::string> SftpSession::receive(const std::string& path) {
     const auto handle = open(path, sftpRead);
     if (!handle) {
         return std::nullopt;
     }
-    std::string all;
-    for (;;) {
-        Packet answer = ask(kindRead, text(*handle) + number64(all.size()) + number(32768));
-        if (answer.type != kindData) {
-            const bool atEnd = statusOf(answer) == 1;
-            close(*handle);
-            return atEnd ? std::optional(all) : std::nullopt;
-        }
-        all += takeText(answer.body);
-    }
+    auto all = receiveOpen(*handle);
+    close(*handle);
+    return all;
+}
+
+int SftpSession::look(const std::string& path) {
+    return status(kindLook, text(path));
+}
+
+int SftpSession::sendOpen(const std::string& handle, const std::string& data) {
+    return status(kindWrite, text(handle) + number64(0) + text(data));
 }
 
 int SftpSession::send(const std::string& path, const std::string& data, std::uint32_t how,
@@ -284,7 +225,7 @@ int SftpSession::send(const std::string& path, const std::string& data, std::uin
     if (!handle) {
         return lastStatus_;
     }
-    const int written = status(kindWrite, text(*handle) + number64(0) + text(data));
+    const int written = sendOpen(*handle, data);
     const int closed = close(*handle);
     return written != sftpGood ? written : closed;
 }

@@ -52,6 +52,8 @@ public:
     std::optional<std::string> realPath(const std::string& path);
 
     // The rest gives an SftpStatus.
+    /// Whether something is there, as far as a link leads.
+    int look(const std::string& path);
     int send(const std::string& path, const std::string& data,
              std::uint32_t how = sftpWrite | sftpMake | sftpCut, std::optional<std::uint32_t> mode = {});
     int makeFolder(const std::string& path);
@@ -76,6 +78,10 @@ public:
     /// The handle of an open file; nothing when the server refuses. It stays open.
     std::optional<std::string> open(const std::string& path, std::uint32_t how,
                                     std::optional<std::uint32_t> mode = {});
+    /// All of it; nothing when the server refuses.
+    std::optional<std::string> receiveOpen(const std::string& handle);
+    /// From its beginning.
+    int sendOpen(const std::string& handle, const std::string& data);
     int setModeOfHandle(const std::string& handle, std::uint32_t mode);
     int close(const std::string& handle);
 
