@@ -1,11 +1,10 @@
-// Where local and anonymous users may go.
-#include "tests/system/support/ftp_service.h"
-
+// Where local users may go, over each protocol, and where guests may, who come over FTP alone.
 #include "standalone/contract/last_error.h"
 #include "tests/standalone/support/store_shares.h"
 #include "tests/support/files.h"
 #include "tests/support/result.h"
 #include "tests/support/text.h"
+#include "tests/system/support/each_protocol.h"
 #include "tests/system/support/running_program.h"
 
 #include <filesystem>
@@ -14,65 +13,105 @@ namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
 
+constexpr auto none = Access::none;
+constexpr auto read = Access::read;
+constexpr auto write = Access::write;
+
 std::string namesIn(FtpSession& session) {
     return session.receive("NLST").value_or("(refused)");
 }
 
-TEST_F(FtpService, confinedUsersSeeTheirHomesAsRoot) {
-    start();
-    FtpSession session(port);
-    ASSERT_EQ(session.logIn("alice"), 230);
-    EXPECT_TRUE(contains(session.command("PWD").text, "\"/\""));
-    EXPECT_EQ(session.receive("RETR /home-of"), "alice");
-    session.command("CDUP");
-    EXPECT_EQ(namesIn(session), "home-of\r\n");
+class Confinement : public EachProtocol {
+protected:
+    void confineToHomes() {
+        record.user_chroot = 1;
+        start();
+    }
+};
+
+TEST_P(Confinement, showsAUserTheHomeAsRoot) {
+    confineToHomes();
+    const auto session = logIn();
+    EXPECT_EQ(session->read("/home-of"), "alice");
+    EXPECT_EQ(rootOf("alice"), "home-of");
+    for (const char* path : {"/etc/passwd", "/mnt/home/bob/home-of", "/../etc/passwd", "/../bob/home-of",
+                             "/proc/self/environ"}) {
+        EXPECT_FALSE(session->read(path)) << path;
+    }
+    EXPECT_TRUE(session->write("/sent", "x"));
+    EXPECT_EQ(contentsOf("/mnt/home/alice/sent"), "x");
+    EXPECT_FALSE(contains(contentsOf("/proc/self/mounts"), "/run/sshd")) << "the server's own mounts stay";
 }
 
-TEST_F(FtpService, confinedUserWithoutAHomeIsRefused) {
-    start();
+TEST_P(Confinement, refusesAUserWithoutAHome) {
+    confineToHomes();
     fs::rename("/mnt/home/carol", "/mnt/home/gone");
-    EXPECT_EQ(FtpSession(port).logIn("carol"), 530);
+    EXPECT_TRUE(isRefused("carol"));
     fs::rename("/mnt/home/gone", "/mnt/home/carol");
-    EXPECT_EQ(FtpSession(port).logIn("carol"), 230);
+    EXPECT_FALSE(isRefused("carol"));
 }
 
-TEST_F(FtpService, wrongPasswordIsRefused) {
-    start();
-    EXPECT_EQ(FtpSession(port).logIn("alice", "bob-secret"), 530);
-    EXPECT_EQ(FtpSession(port).logIn("alice", ""), 530);
-    EXPECT_EQ(FtpSession(port).logIn("root", "x"), 530);
-    EXPECT_EQ(FtpSession(port).logIn("nobody-like-this", "x"), 530);
+TEST_P(Confinement, refusesAWrongPassword) {
+    confineToHomes();
+    EXPECT_FALSE(tryToLogIn("alice", "bob-secret")->isLoggedIn());
+    EXPECT_FALSE(tryToLogIn("alice", "")->isLoggedIn());
+    EXPECT_FALSE(tryToLogIn("root", "x")->isLoggedIn());
+    EXPECT_FALSE(tryToLogIn("nobody-like-this", "x")->isLoggedIn());
 }
 
-TEST_F(FtpService, unconfinedUsersSeeTheOfferedSharesSideBySide) {
-    writeFile(addShare("music", "a/music", Access::none) / "song", "la");
-    writeFile(addShare("odd \"name\" #%{env:HOME} ä", "b", Access::none) / "file", "odd");
-    addShare("secret", "c", Access::none, false);
-    record.user_chroot = 0;
+TEST_P(Confinement, showsTheOfferedSharesSideBySide) {
+    writeFile(addShare("music", "a/music", none) / "song", "la");
+    writeFile(addShare("odd \"name\" #%{env:HOME} ä", "b", none) / "file", "odd");
+    addShare("secret", "c", none, false);
     start();
-    FtpSession session(port);
-    ASSERT_EQ(session.logIn("alice"), 230);
-    EXPECT_TRUE(contains(session.command("PWD").text, "\"/\""));
-    const std::string names = namesIn(session);
-    EXPECT_TRUE(contains(names, "music")) << names;
-    EXPECT_FALSE(contains(names, "secret")) << names;
-    EXPECT_EQ(session.receive("RETR /music/song"), "la");
-    EXPECT_EQ(session.receive("RETR /odd \"name\" #%{env:HOME} ä/file"), "odd");
-    EXPECT_EQ(session.send("STOR /music/new", "x"), 226);
-    EXPECT_EQ(session.command("MKD /made").code, 550) << "nobody writes beside the shares";
+    const auto session = logIn();
+    EXPECT_EQ(rootOf("alice"), "music odd \"name\" #%{env:HOME} ä");
+    EXPECT_EQ(session->read("/music/song"), "la");
+    EXPECT_EQ(session->read("/odd \"name\" #%{env:HOME} ä/file"), "odd");
+    EXPECT_TRUE(session->write("/music/new", "x"));
+    EXPECT_FALSE(session->makeFolder("/made")) << "nobody writes beside the shares";
     EXPECT_FALSE(contains(contentsOf("/proc/self/mounts"), "velt-shares")) << "the server's own mounts stay";
 }
 
-TEST_F(FtpService, aShareThatStartsWithDotsIsShown) {
-    writeFile(addShare("..data", "dots", Access::none) / "file", "dotted");
-    record.user_chroot = 0;
+TEST_P(Confinement, showsAShareThatStartsWithDots) {
+    writeFile(addShare("..data", "dots", none) / "file", "dotted");
     start();
-    FtpSession session(port);
-    ASSERT_EQ(session.logIn("alice"), 230);
-    EXPECT_EQ(session.receive("RETR /..data/file"), "dotted");
+    EXPECT_EQ(logIn()->read("/..data/file"), "dotted");
 }
 
-TEST_F(FtpService, aShareThatCannotBeMountedIsLeftOut) {
+// Each way out that a user might try, with what it leads to.
+TEST_P(Confinement, hasNoWayOut) {
+    share("rw", {{"alice", write}});
+    share("ro", {{"alice", read}});
+    share("no", {{"alice", none}});
+    share("outer", {{"alice", write}});
+    share("inner", {{"alice", none}}, {}, "/mnt/srv/outer/a/inner");
+    for (const char* target : {"/etc/passwd", "/mnt/srv/no/file", "../no/file", "/no/file"}) {
+        fs::create_symlink(target, "/mnt/srv/rw/to" + std::to_string(std::hash<std::string>()(target)));
+    }
+    start();
+    const auto session = logIn();
+    EXPECT_EQ(rootOf("alice"), "outer ro rw");
+    for (const std::string path :
+         {"/etc/passwd", "/../etc/passwd", "/mnt/home/bob/home-of", "/no/file", "/mnt/srv/no/file",
+          "/rw/../no/file", "/outer/a/inner/file", "/inner/file"}) {
+        EXPECT_FALSE(session->read(path)) << path;
+        EXPECT_FALSE(session->write(path, "x")) << path;
+    }
+    for (const auto& entry : fs::directory_iterator("/mnt/srv/rw")) {
+        if (entry.is_symlink()) {
+            EXPECT_FALSE(session->read("/rw/" + entry.path().filename().string())) << entry.path();
+            EXPECT_FALSE(session->write("/rw/" + entry.path().filename().string(), "x")) << entry.path();
+        }
+    }
+    EXPECT_FALSE(session->enter("/outer/a/inner"));
+    EXPECT_EQ(session->read("/ro/file"), "ro");
+    EXPECT_FALSE(session->write("/ro/file", "x"));
+    EXPECT_EQ(contentsOf("/mnt/srv/no/file") + contentsOf("/mnt/srv/ro/file"), "noro");
+    EXPECT_EQ(contentsOf("/mnt/srv/outer/a/inner/file"), "inner");
+}
+
+TEST_P(Confinement, leavesAShareOutThatCannotBeMounted) {
     writeFile(addShare("music", "music", Access::none) / "song", "la");
     // A folder of another mount namespace can be opened there, and not be mounted.
     const std::vector<std::string> asAlice = {"/usr/bin/setpriv", "--reuid=1001", "--regid=1001",
@@ -92,11 +131,34 @@ TEST_F(FtpService, aShareThatCannotBeMountedIsLeftOut) {
     ASSERT_EQ(messageOf(storeShares(*shares)), "");
     record.user_chroot = 0;
     start();
-    FtpSession session(port);
-    ASSERT_EQ(session.logIn("alice"), 230);
-    EXPECT_EQ(namesIn(session), "music\r\n");
-    EXPECT_EQ(session.receive("RETR /music/song"), "la");
+    const auto session = logIn();
+    EXPECT_EQ(namesIn(*session), "music");
+    EXPECT_EQ(session->read("/music/song"), "la");
 }
+
+TEST_P(Confinement, followsASettingThatChangedSinceTheStart) {
+    share("rw", {{"alice", write}});
+    start();
+    EXPECT_EQ(rootOf("alice"), "rw");
+    record.user_chroot = 1;
+    if (overFtp()) {
+        start(); // FTP has it from its own configuration, and is started with each change of its settings
+    } else {
+        ASSERT_EQ(VELTFTPConfSet(record), 0);
+    }
+    EXPECT_EQ(rootOf("alice"), "home-of");
+}
+
+// Guests are the account "ftp", which has no password.
+TEST_P(Confinement, letsGuestsInOverFtpAlone) {
+    addShare("public", "public", read);
+    letAnonymousIn();
+    start();
+    EXPECT_EQ(tryToLogIn("anonymous", "a@b")->isLoggedIn(), overFtp());
+    EXPECT_EQ(tryToLogIn("ftp", "")->isLoggedIn(), overFtp());
+}
+
+VELT_OVER_EACH_PROTOCOL(Confinement);
 
 TEST_F(FtpService, anonymousUsersAreRefusedByDefault) {
     start();
@@ -105,8 +167,8 @@ TEST_F(FtpService, anonymousUsersAreRefusedByDefault) {
 }
 
 TEST_F(FtpService, anonymousUsersAreConfinedToTheirShare) {
-    writeFile(addShare("public", "pub \"x\" %{env:HOME}", Access::read) / "notice", "hello");
-    addShare("music", "music", Access::write);
+    writeFile(addShare("public", "pub \"x\" %{env:HOME}", read) / "notice", "hello");
+    addShare("music", "music", write);
     letAnonymousIn("public");
     start();
     for (const char* user : {"anonymous", "ftp"}) {
@@ -122,7 +184,7 @@ TEST_F(FtpService, anonymousUsersAreConfinedToTheirShare) {
 }
 
 TEST_F(FtpService, anonymousUsersWriteWhereThatIsGranted) {
-    const auto folder = addShare("public", "public", Access::write);
+    const auto folder = addShare("public", "public", write);
     letAnonymousIn("public");
     start();
     FtpSession session(port);
@@ -132,7 +194,7 @@ TEST_F(FtpService, anonymousUsersWriteWhereThatIsGranted) {
 }
 
 TEST_F(FtpService, anonymousUsersAreRefusedWithoutTheirShare) {
-    addShare("closed", "closed", Access::none);
+    addShare("closed", "closed", none);
     for (const char* share : {"closed", "absent"}) {
         letAnonymousIn(share);
         start();
@@ -142,9 +204,9 @@ TEST_F(FtpService, anonymousUsersAreRefusedWithoutTheirShare) {
 }
 
 TEST_F(FtpService, unconfinedAnonymousUsersSeeTheSharesTheyMayReach) {
-    writeFile(addShare("readable", "r", Access::read) / "file", "r");
-    addShare("writable", "w", Access::write);
-    addShare("closed", "c", Access::none);
+    writeFile(addShare("readable", "r", read) / "file", "r");
+    addShare("writable", "w", write);
+    addShare("closed", "c", none);
     letAnonymousIn();
     start();
     FtpSession session(port);
@@ -159,7 +221,7 @@ TEST_F(FtpService, unconfinedAnonymousUsersSeeTheSharesTheyMayReach) {
 }
 
 TEST_F(FtpService, confinedUsersDoNotSeeTheSharesOfAnonymousOnes) {
-    addShare("readable", "r", Access::read);
+    addShare("readable", "r", read);
     letAnonymousIn();
     start();
     FtpSession session(port);

@@ -1,6 +1,6 @@
-// What nobody moves over FTP: the folders that chroot rules of others lead to.
+// What nobody moves, over either protocol: the folders that chroot rules of others lead to.
 #include "tests/support/files.h"
-#include "tests/system/support/shared_folders.h"
+#include "tests/system/support/each_protocol.h"
 
 namespace velt::test {
 namespace {
@@ -8,10 +8,10 @@ namespace fs = std::filesystem;
 
 constexpr Access write = Access::write;
 
-class RuleFolders : public SharedFolders {
+class RuleFolders : public EachProtocol {
 protected:
     void SetUp() override {
-        SharedFolders::SetUp();
+        EachProtocol::SetUp();
         pub_ = share("pub", {{"alice", write}, {"bob", write}, {"ftp", write}});
         makeFolder("a/x", 0777);
         makeFolder("a", 0777);
@@ -27,55 +27,63 @@ protected:
         EXPECT_EQ(chown((pub_ / name).c_str(), bobId, bobId), 0);
         EXPECT_EQ(chmod((pub_ / name).c_str(), mode), 0);
     }
-    static int move(FtpSession& session, const std::string& from, const std::string& to) {
-        const int known = session.command("RNFR " + from).code;
-        return known == 350 ? session.command("RNTO " + to).code : known;
+    static void expectToStay(FileClient& client, const std::string& path, const std::string& to) {
+        EXPECT_FALSE(client.rename(path, to)) << path;
+        EXPECT_FALSE(client.replace(path, to)) << path;
+        EXPECT_FALSE(client.removeFolder(path)) << path;
+        EXPECT_FALSE(client.remove(path)) << path;
     }
 
     fs::path pub_;
 };
 
-TEST_F(RuleFolders, stayWhereTheyAre) {
-    FtpSession alice(port);
-    ASSERT_EQ(alice.logIn("alice"), 230);
-    FtpSession guest(port);
-    ASSERT_EQ(guest.logIn("anonymous", "x@"), 230);
-    for (FtpSession* const session : {&alice, &guest}) {
+TEST_P(RuleFolders, stayWhereTheyAre) {
+    std::vector<std::unique_ptr<FileClient>> sessions;
+    sessions.push_back(logIn());
+    if (overFtp()) {
+        sessions.push_back(logIn("ftp")); // guests come over FTP alone
+    }
+    for (const auto& session : sessions) {
         for (const char* const folder : {"/pub/a/x", "/pub/a"}) {
-            EXPECT_EQ(move(*session, folder, "/pub/away"), 550) << folder;
-            EXPECT_EQ(session->command(std::string("RMD ") + folder).code, 550) << folder;
+            expectToStay(*session, folder, "/pub/away");
         }
-        EXPECT_EQ(session->send("STOR /pub/a/x/new", "x"), 226) << "what is in it is free";
-        EXPECT_EQ(move(*session, "/pub/a/x/new", "/pub/a/new"), 250);
-        ASSERT_EQ(session->command("MKD /pub/free").code, 257);
-        EXPECT_EQ(move(*session, "/pub/free", "/pub/freed"), 250);
-        EXPECT_EQ(session->command("RMD /pub/freed").code, 250);
+        EXPECT_TRUE(session->write("/pub/a/x/new", "x")) << "what is in it is free";
+        EXPECT_TRUE(session->rename("/pub/a/x/new", "/pub/a/new"));
+        EXPECT_TRUE(session->remove("/pub/a/new"));
+        ASSERT_TRUE(session->makeFolder("/pub/free"));
+        EXPECT_TRUE(session->rename("/pub/free", "/pub/freed"));
+        EXPECT_TRUE(session->removeFolder("/pub/freed"));
     }
 }
 
-TEST_F(RuleFolders, areNotPutInPlaceWhileTheyAreMissing) {
+TEST_P(RuleFolders, areNotPutInPlaceWhileTheyAreMissing) {
     fs::remove(pub_ / "a/x");
-    FtpSession alice(port);
-    ASSERT_EQ(alice.logIn("alice"), 230);
-    EXPECT_EQ(move(alice, "/pub/dept", "/pub/a/x"), 550);
-    EXPECT_EQ(move(alice, "/pub/dept", "/pub/a/X"), 550) << "some file systems know no difference";
-    EXPECT_EQ(alice.command("MKD /pub/a/x").code, 550);
-    EXPECT_EQ(alice.send("STOR /pub/a/x", "x"), 550);
-    EXPECT_EQ(alice.command("MKD /pub/a/y").code, 257);
-    EXPECT_EQ(FtpSession(port).logIn("bob"), 530);
+    const auto alice = logIn();
+    // Some file systems know no difference.
+    for (const char* const place : {"/pub/a/x", "/pub/a/X"}) {
+        EXPECT_FALSE(alice->rename("/pub/dept", place)) << place;
+        EXPECT_FALSE(alice->replace("/pub/dept", place)) << place;
+        EXPECT_FALSE(alice->makeFolder(place)) << place;
+        EXPECT_FALSE(alice->write(place, "x")) << place;
+        EXPECT_FALSE(alice->symbolicLink("../dept", place)) << place;
+        EXPECT_FALSE(alice->hardLink("/pub/file", place)) << place;
+    }
+    EXPECT_TRUE(alice->makeFolder("/pub/a/y"));
+    EXPECT_TRUE(isRefused("bob"));
 }
 
-TEST_F(RuleFolders, areReachedByLinksThatStay) {
+TEST_P(RuleFolders, areReachedByLinksThatStay) {
     fs::rename(pub_ / "a/x", pub_ / "real");
     fs::create_directory_symlink("real", pub_ / "x");
     storeRules({"u:1002:/pub/x"});
-    FtpSession alice(port);
-    ASSERT_EQ(alice.logIn("alice"), 230);
-    EXPECT_EQ(alice.command("DELE /pub/x").code, 550);
-    EXPECT_EQ(move(alice, "/pub/x", "/pub/y"), 550);
-    EXPECT_EQ(move(alice, "/pub/real", "/pub/y"), 550);
-    EXPECT_EQ(FtpSession(port).logIn("bob"), 230);
+    const auto alice = logIn();
+    expectToStay(*alice, "/pub/x", "/pub/y");
+    expectToStay(*alice, "/pub/real", "/pub/y");
+    EXPECT_FALSE(alice->replace("/pub/file", "/pub/x")) << "what would take the link's place";
+    EXPECT_FALSE(isRefused("bob"));
 }
+
+VELT_OVER_EACH_PROTOCOL(RuleFolders);
 
 } // namespace
 } // namespace velt::test

@@ -4,12 +4,11 @@
 #include "standalone/daemons/sshd/sshd_plan.h"
 #include "tests/support/files.h"
 #include "tests/support/text.h"
+#include "tests/support/waiting.h"
 #include "tests/system/support/sftp_session.h"
 #include "tests/system/support/shared_folders.h"
 
 #include <unistd.h>
-
-#include <functional>
 
 namespace velt::test {
 namespace {
@@ -33,54 +32,6 @@ protected:
         return session;
     }
 };
-
-TEST_F(SftpView, isTheHomeOfWhoIsConfinedToIt) {
-    startHomes();
-    auto session = logIn();
-    EXPECT_EQ(session.realPath("."), "/");
-    EXPECT_EQ(joined(session.list("/")), "home-of");
-    EXPECT_EQ(session.receive("/home-of"), "alice");
-    for (const char* path :
-         {"/etc/passwd", "/mnt/home/bob/home-of", "/../etc/passwd", "/proc/self/environ"}) {
-        EXPECT_FALSE(session.receive(path)) << path;
-    }
-    EXPECT_EQ(session.send("/sent", "x"), sftpGood);
-    EXPECT_EQ(contentsOf(home / "sent"), "x");
-    EXPECT_FALSE(contains(contentsOf("/proc/self/mounts"), "/run/sshd")) << "the server's own mounts stay";
-}
-
-TEST_F(SftpView, isTheSharesSideBySideWithTheirGrants) {
-    share("rw", {{"alice", write}});
-    share("ro", {{"alice", read}});
-    share("no", {{"alice", none}});
-    startSftp();
-    auto session = logIn();
-    EXPECT_EQ(joined(session.list("/")), "ro rw");
-    EXPECT_EQ(session.receive("/ro/file"), "ro");
-    EXPECT_EQ(session.send("/ro/new", "x"), sftpDenied);
-    EXPECT_EQ(session.makeFolder("/ro/new"), sftpDenied);
-    EXPECT_EQ(session.remove("/ro/file"), sftpDenied);
-    EXPECT_EQ(session.move("/ro/file", "/ro/other"), sftpDenied);
-    EXPECT_EQ(session.setMode("/ro/file", 0600), sftpDenied);
-    EXPECT_EQ(session.setTimes("/ro/file", 1000), sftpDenied);
-    EXPECT_EQ(session.cut("/ro/file", 1), sftpDenied);
-    EXPECT_FALSE(session.receive("/no/file"));
-    EXPECT_EQ(session.send("/rw/new", "x"), sftpGood);
-    EXPECT_EQ(session.makeFolder("/made"), sftpDenied) << "nobody writes beside the shares";
-    EXPECT_EQ(contentsOf("/mnt/srv/ro/file"), "ro");
-}
-
-TEST_F(SftpView, followsASettingThatChangedSinceTheStart) {
-    share("rw", {{"alice", write}});
-    startSftp();
-    EXPECT_EQ(joined(logIn().list("/")), "rw");
-    record.user_chroot = 1;
-    ASSERT_EQ(VELTFTPConfSet(record), 0);
-    EXPECT_EQ(joined(logIn().list("/")), "home-of");
-    storeRules({"g:2001:/rw"});
-    EXPECT_EQ(joined(logIn().list("/")), "file");
-    EXPECT_EQ(joined(logIn("carol").list("/")), "home-of") << "she is not of the group";
-}
 
 TEST_F(SftpView, isNoneWhereNobodyKnowsWhatMayBeSeen) {
     share("rw", {{"alice", write}});
@@ -122,6 +73,7 @@ TEST_F(SftpView, isAnEmptyFolderWithoutOurLibrary) {
     daemon.stop();
 }
 
+// Beside what homes_own_files_test.cpp tries over each protocol.
 TEST_F(SftpView, keepsTheFilesThatProgramsObey) {
     fs::create_directories(home / ".ssh");
     ASSERT_EQ(chown((home / ".ssh").c_str(), aliceId, aliceId), 0);
@@ -129,29 +81,13 @@ TEST_F(SftpView, keepsTheFilesThatProgramsObey) {
     ASSERT_EQ(chmod((home / ".ssh/authorized_keys").c_str(), 0644), 0);
     startHomes();
     auto session = logIn();
-    EXPECT_EQ(session.receive("/.ssh/authorized_keys"), "key");
-    for (const char* path :
-         {"/.ssh/authorized_keys", "/.ssh/new", "/.profile", "/.config", "/bin", "/etc", "/lib"}) {
-        EXPECT_EQ(session.send(path, "x"), sftpDenied) << path;
-        EXPECT_EQ(session.makeFolder(path), sftpDenied) << path;
-        EXPECT_EQ(session.symbolicLink("/home-of", path), sftpDenied) << path;
-        EXPECT_EQ(session.hardLink("/home-of", path), sftpDenied) << path;
-        EXPECT_EQ(session.move("/home-of", path), sftpDenied) << path;
-        EXPECT_EQ(session.rename("/home-of", path), sftpDenied) << path;
-    }
+    EXPECT_EQ(session.realPath("."), "/");
     for (const char* path : {"/.ssh/authorized_keys", "/.ssh"}) {
-        EXPECT_EQ(session.setMode(path, 0777), sftpDenied) << path;
         EXPECT_EQ(session.setModeOfLink(path, 0777), sftpDenied) << path;
         EXPECT_EQ(session.setOwner(path, aliceId, 2001), sftpDenied) << path;
-        EXPECT_EQ(session.setTimes(path, 1000), sftpDenied) << path;
-        EXPECT_EQ(session.move(path, "/moved"), sftpDenied) << path;
     }
-    EXPECT_EQ(session.remove("/.ssh/authorized_keys"), sftpDenied);
-    EXPECT_EQ(session.cut("/.ssh/authorized_keys", 0), sftpDenied);
-    EXPECT_EQ(session.hardLink("/.ssh/authorized_keys", "/twin"), sftpDenied);
-    EXPECT_EQ(session.setModeOfOpen("/.ssh/authorized_keys", 0666), sftpDenied);
     EXPECT_EQ(session.setTimesOfOpen("/.ssh/authorized_keys", 1000), sftpDenied);
-    EXPECT_EQ(session.symbolicLink("/.ssh/authorized_keys", "/way"), sftpGood);
+    ASSERT_EQ(session.symbolicLink("/.ssh/authorized_keys", "/way"), sftpGood);
     EXPECT_EQ(session.send("/way", "x"), sftpDenied);
     EXPECT_EQ(session.setModeOfOpen("/way", 0666), sftpDenied);
     EXPECT_EQ(contentsOf(home / ".ssh/authorized_keys"), "key");
@@ -189,63 +125,15 @@ TEST_F(SftpView, letsNoFileRunWithTheRightsOfItsOwnerOrGroup) {
 
 TEST_F(SftpView, makesLinksThatLeadOutOfItNowhere) {
     share("rw", {{"alice", write}});
-    share("ro", {{"alice", read}});
-    share("no", {{"alice", none}});
-    fs::create_symlink("/mnt/srv/no/file", "/mnt/srv/rw/stands");
     startSftp();
     auto session = logIn();
-    EXPECT_FALSE(session.receive("/rw/stands"));
-    for (const char* target : {"/etc/passwd", "/mnt/srv/no/file", "../../no/file", "/no/file"}) {
+    for (const char* target : {"/etc/passwd", "../../etc/passwd", "/mnt/home/bob/home-of"}) {
         ASSERT_EQ(session.symbolicLink(target, "/rw/link"), sftpGood) << target;
-        EXPECT_FALSE(session.receive("/rw/link")) << target;
         EXPECT_EQ(session.target("/rw/link"), target);
+        EXPECT_FALSE(session.receive("/rw/link")) << target;
+        EXPECT_EQ(session.send("/rw/link", "x"), sftpAbsent) << target;
         ASSERT_EQ(session.remove("/rw/link"), sftpGood);
     }
-    EXPECT_EQ(session.hardLink("/rw/file", "/rw/twin"), sftpGood);
-    EXPECT_NE(session.hardLink("/ro/file", "/rw/taken"), sftpGood);
-    EXPECT_EQ(session.symbolicLink("/rw/file", "/ro/link"), sftpDenied);
-}
-
-TEST_F(SftpView, keepsInnerSharesShutWhateverIsMoved) {
-    share("outer", {{"alice", write}});
-    share("inner", {{"alice", none}}, {}, "/mnt/srv/outer/a/inner");
-    startSftp();
-    auto session = logIn();
-    EXPECT_FALSE(session.receive("/outer/a/inner/file"));
-    EXPECT_EQ(joined(session.list("/outer/a/inner")), "(closed)");
-    for (const char* path : {"/outer/a", "/outer/a/inner"}) {
-        EXPECT_NE(session.move(path, "/outer/b"), sftpGood) << path;
-        EXPECT_NE(session.rename(path, "/outer/b"), sftpGood) << path;
-    }
-    EXPECT_FALSE(fs::exists("/mnt/srv/outer/b"));
-}
-
-TEST_F(SftpView, endsWhereAnOldSessionWouldChangeNames) {
-    const auto outer = share("outer", {{"alice", write}});
-    writeFile(outer / "old", "", aliceId);
-    fs::create_directories(outer / "folder");
-    startSftp();
-    const std::vector<std::function<int(SftpSession&)>> changes{
-        [](SftpSession& session) { return session.makeFolder("/outer/new"); },
-        [](SftpSession& session) { return session.removeFolder("/outer/folder"); },
-        [](SftpSession& session) { return session.remove("/outer/old"); },
-        [](SftpSession& session) { return session.move("/outer/old", "/outer/new"); },
-        [](SftpSession& session) { return session.rename("/outer/old", "/outer/new"); },
-        [](SftpSession& session) { return session.hardLink("/outer/old", "/outer/new"); },
-        [](SftpSession& session) { return session.symbolicLink("old", "/outer/new"); },
-    };
-    for (const auto& change : changes) {
-        auto session = logIn();
-        store();
-        EXPECT_EQ(session.receive("/outer/file"), "outer");
-        EXPECT_EQ(session.send("/outer/file", "outer"), sftpGood);
-        EXPECT_EQ(change(session), sftpEnded) << &change - changes.data();
-    }
-    auto later = logIn();
-    EXPECT_EQ(joined(later.list("/outer")), "file folder old");
-    EXPECT_EQ(later.makeFolder("/outer/new"), sftpGood);
-    EXPECT_TRUE(
-        contains(DaemonProcess::output(), "session of 'alice' ended: the shares or rules have changed"));
 }
 
 TEST_F(SftpView, isTheSameForEachChannelAndProgramOfAConnection) {
@@ -292,6 +180,8 @@ TEST_F(SftpView, isNotServedWhereNobodyMayMount) {
     const auto plan = planSftpDaemon();
     ASSERT_EQ(messageOf(plan), "");
     stopSftp();
+    // A child of its start may have the socket for a moment more.
+    ASSERT_TRUE(waitUntil([] { return !isListening(sftpPort); }, patience));
     DaemonOrder order = (*plan)->order;
     order.arguments.insert(order.arguments.begin(),
                            {"/usr/bin/setpriv", "--bounding-set", "-sys_admin", "--inh-caps", "-sys_admin"});
