@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -19,6 +20,15 @@ namespace {
 /// A field may have lost its end.
 template<std::size_t Size> std::string whole(const char (&field)[Size]) {
     return {field, ::strnlen(field, Size)};
+}
+
+/// What the page says, as far as it can be: it may hold anything.
+std::int64_t timeIn(std::int64_t microseconds) {
+    return std::chrono::floor<std::chrono::microseconds>(pageTime(microseconds).time_since_epoch()).count();
+}
+
+std::int64_t between(std::int64_t begin, std::int64_t end) {
+    return std::max<std::int64_t>(timeIn(end) - timeIn(begin), 0);
 }
 
 class EndedSession {
@@ -52,9 +62,12 @@ bool EndedSession::write(std::uint32_t number, const std::vector<velt_member>& o
     const auto protocol = static_cast<SessionProtocol>(std::min<std::uint32_t>(page_.protocol, velt_sftp));
     // When it ended, nobody knows; it was there at its last activity.
     std::vector<velt_member> members{
-        {"time", nullptr, page_.active},  {"session", name_.text.c_str(), 0},
-        {"number", nullptr, number},      {"protocol", protocolName(protocol).data(), 0},
-        {"user", user_.c_str(), 0},       {"account", account_.c_str(), 0},
+        {"time", nullptr, timeIn(page_.active)},
+        {"session", name_.text.c_str(), 0},
+        {"number", nullptr, number},
+        {"protocol", protocolName(protocol).data(), 0},
+        {"user", user_.c_str(), 0},
+        {"account", account_.c_str(), 0},
         {"address", address_.c_str(), 0},
     };
     members.insert(members.end(), own.begin(), own.end());
@@ -78,7 +91,7 @@ bool EndedSession::recordTransfer() {
                   {"share", share.c_str(), 0},
                   {"within", within.c_str(), 0},
                   {"octets", nullptr, static_cast<std::int64_t>(page_.transfer_octets)},
-                  {"duration", nullptr, std::max<std::int64_t>(page_.active - page_.transfer_since, 0)}});
+                  {"duration", nullptr, between(page_.transfer_since, page_.active)}});
 }
 
 std::string EndedSession::reason() const {
@@ -91,13 +104,12 @@ bool EndedSession::recordEnd() {
     const std::string why = reason();
     const std::uint64_t in = page_.transfer == velt_upload ? page_.transfer_octets : 0;
     const std::uint64_t out = page_.transfer == velt_download ? page_.transfer_octets : 0;
-    return write(velt_closing_record,
-                 {{"kind", "session-closed", 0},
-                  {"result", "done", 0},
-                  {"reason", why.c_str(), 0},
-                  {"in", nullptr, static_cast<std::int64_t>(page_.octets_in + in)},
-                  {"out", nullptr, static_cast<std::int64_t>(page_.octets_out + out)},
-                  {"duration", nullptr, std::max<std::int64_t>(page_.active - page_.since, 0)}});
+    return write(velt_closing_record, {{"kind", "session-closed", 0},
+                                       {"result", "done", 0},
+                                       {"reason", why.c_str(), 0},
+                                       {"in", nullptr, static_cast<std::int64_t>(page_.octets_in + in)},
+                                       {"out", nullptr, static_cast<std::int64_t>(page_.octets_out + out)},
+                                       {"duration", nullptr, between(page_.since, page_.active)}});
 }
 
 } // namespace
