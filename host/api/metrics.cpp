@@ -82,6 +82,8 @@ struct Metrics::Families {
     Counters logins = counter("velt_logins_total", "Logins, by what became of them");
     prometheus::Counter& lost =
         counter("velt_records_lost_total", "Records of what sessions did that could not be written").Add({});
+    prometheus::Counter& damaged =
+        counter("velt_records_damaged_total", "Lines that sessions wrote and that were no records").Add({});
     std::mutex mutex;
     std::map<std::string, std::uint64_t> seenRestarts;
     std::map<std::map<std::string, std::string>, double> seenFindings; ///< by their labels
@@ -151,6 +153,7 @@ void Metrics::setActivity(const ActivityTotals& totals, std::uint64_t lost) {
         }
     }
     raise(families_->lost, lost);
+    raise(families_->damaged, totals.damaged);
 }
 
 std::string Metrics::text() const {

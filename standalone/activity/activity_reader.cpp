@@ -179,6 +179,10 @@ Result<> Reader::open() {
 Result<bool> Reader::take() {
     VELT_RETURN_IF_ERROR(open());
     VELT_ASSIGN_OR_RETURN(const auto taken, spools_->take());
+    {
+        const std::lock_guard lock(mutex_);
+        totals_.damaged += taken.damaged;
+    }
     for (const OperationRecord& record : taken.records) {
         tell(record);
     }

@@ -59,6 +59,7 @@ struct ActivityTotals {
     /// By protocol and outcome: "accepted", "password", "configuration", "banned", "limit", "other".
     std::map<std::pair<SessionProtocol, std::string>, std::uint64_t> logins;
     std::uint64_t records = 0; ///< taken over
+    std::uint64_t damaged = 0; ///< lines that sessions wrote and that were no records
 };
 
 ActivityTotals activityTotals();

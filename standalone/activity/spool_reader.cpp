@@ -144,7 +144,9 @@ Result<> SpoolReader::takePart(Spool& spool, Taken& all) {
     spool.taken = from + taken;
     giveRoomBack(spool.file.get(), spool.taken);
     std::ranges::move(records, std::back_inserter(all.records));
-    all.damaged += read.damaged;
+    // What nobody will end is no record; a stretch that is passed over in parts counts at its end.
+    const bool isCut = read.taken == 0 && spool.last && text->find_first_not_of('\0') != text->npos;
+    all.damaged += read.damaged + (isCut ? 1 : 0);
     all.more = all.more || spool.taken < spool.size;
     return {};
 }

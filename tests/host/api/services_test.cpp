@@ -183,9 +183,10 @@ TEST_F(HostServices, TheStatusHasTheirSessions) {
 
 TEST_F(HostServices, WhatUsersDoIsMeasured) {
     using velt::SessionProtocol;
-    for (const char* const line : {"velt_sessions{protocol=\"ftp\"} 0", "velt_records_lost_total 0",
-                                   "velt_transfer_octets_total{direction=\"download\",protocol=\"ftp\"} 0",
-                                   "velt_logins_total{outcome=\"configuration\",protocol=\"sftp\"} 0"}) {
+    for (const char* const line :
+         {"velt_sessions{protocol=\"ftp\"} 0", "velt_records_lost_total 0", "velt_records_damaged_total 0",
+          "velt_transfer_octets_total{direction=\"download\",protocol=\"ftp\"} 0",
+          "velt_logins_total{outcome=\"configuration\",protocol=\"sftp\"} 0"}) {
         EXPECT_TRUE(measured(line)) << line << "\n" << get("/metrics").body;
     }
     access.activity.sessions = {{SessionProtocol::ftp, 2}};
@@ -193,9 +194,11 @@ TEST_F(HostServices, WhatUsersDoIsMeasured) {
     access.activity.logins = {{{SessionProtocol::ftps, "password"}, 9},
                               {{SessionProtocol::ftps, "anything else"}, 1}};
     access.lostRecords = 4;
+    access.activity.damaged = 6;
     for (int i = 0; i < 2; ++i) {
         for (const char* const line :
              {"velt_sessions{protocol=\"ftp\"} 2", "velt_records_lost_total 4",
+              "velt_records_damaged_total 6",
               "velt_transfer_octets_total{direction=\"upload\",protocol=\"sftp\"} 1000",
               "velt_transfer_octets_total{direction=\"download\",protocol=\"sftp\"} 5",
               "velt_logins_total{outcome=\"password\",protocol=\"ftps\"} 9"}) {

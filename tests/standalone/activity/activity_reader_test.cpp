@@ -3,6 +3,7 @@
 
 #include "standalone/activity/operation_search.h"
 #include "standalone/activity/session_activity.h"
+#include "standalone/activity/spool.h"
 #include "tests/standalone/support/state_folder.h"
 #include "tests/support/result.h"
 #include "tests/support/waiting.h"
@@ -89,6 +90,17 @@ TEST_F(ActivityReader, TellsAndKeepsWhatSessionsDo) {
     EXPECT_EQ((activityTotals().logins[{SessionProtocol::sftp, "accepted"}]) - accepted, 1U);
     EXPECT_GE((activityTotals().logins[{SessionProtocol::sftp, "password"}]), 1U);
     EXPECT_EQ(activityProblem(), "");
+}
+
+TEST_F(ActivityReader, CountsDamagedLines) {
+    const auto damaged = activityTotals().damaged;
+    startActivityReader();
+    const int spool = velt_open_spool(root_.path().c_str());
+    EXPECT_EQ(write(spool, "rubbish\n\x1e{}\n", 12), 12);
+    close(spool);
+    session([] { velt_session_closed("logged out"); });
+    ASSERT_TRUE(becomes([this] { return told().ends_with("session-closed; "); })) << told();
+    EXPECT_EQ(activityTotals().damaged - damaged, 2U);
 }
 
 TEST_F(ActivityReader, TellsOfRunningTransfers) {

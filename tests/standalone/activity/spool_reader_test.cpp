@@ -166,6 +166,41 @@ TEST_F(SpoolReaderTest, RemovesAFormerSpoolThatEndsInTheMiddleOfARecord) {
     EXPECT_EQ(files(), 0U);
 }
 
+TEST_F(SpoolReaderTest, LosesADamagedLineOnly) {
+    const std::string good = lineOf(1);
+    const std::string json = good.substr(1, good.size() - 2);
+    for (const std::string& damaged :
+         {good.substr(0, good.size() / 2) + "\n", good.substr(0, good.size() / 2), std::string("\x1e\n"),
+          std::string("rubbish\n"), "\x1e" + json + json + "\n", "\x1e[" + json + "]\n",
+          std::string("\x1e{\"kind\":\"upload\"}\n"), std::string("\x1e\xff\xfe{}\n"),
+          "\x1e" + std::string(10000, '[') + "\n", "\x1e" + std::string(15000, 'x') + "\n", json + "\n"}) {
+        reader_.reset();
+        store_.reset();
+        std::filesystem::remove_all(statePath("/var"));
+        open();
+        const UniqueFd spool = session();
+        write(spool, 10);
+        EXPECT_EQ(::write(spool.get(), damaged.data(), damaged.size()), static_cast<ssize_t>(damaged.size()));
+        write(spool, 11);
+        const auto taken = reader_->take();
+        ASSERT_EQ(test::messageOf(taken), "");
+        EXPECT_EQ(taken->records.size(), 2U) << damaged.substr(0, 60);
+        EXPECT_EQ(taken->damaged, 1U) << damaged.substr(0, 60);
+    }
+}
+
+TEST_F(SpoolReaderTest, CountsARecordThatNobodyWillEnd) {
+    open({4096, 10000});
+    UniqueFd former = session();
+    write(former, 0, 200);
+    EXPECT_EQ(takeAll(), 200U);
+    EXPECT_EQ(::write(former.get(), "\x1e{\"kind\"", 9), 9);
+    EXPECT_EQ(reader_->take().valueOr({}).damaged, 0U) << "it may be going on";
+    former.reset();
+    EXPECT_EQ(reader_->take().valueOr({}).damaged, 1U);
+    EXPECT_EQ(reader_->take().valueOr({}).damaged, 0U);
+}
+
 TEST_F(SpoolReaderTest, TakesMoreThanFitsIntoItsMemory) {
     open({32768, 1 << 30});
     const UniqueFd spool = session();
