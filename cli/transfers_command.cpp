@@ -70,8 +70,10 @@ std::string resultOf(const Json::Value& record) {
 }
 
 std::string placesOf(const Json::Value& record) {
-    const std::string target = textAt(record, "new_path");
-    return textAt(record, "path") + (target.empty() ? "" : " -> " + target);
+    const std::string next = textAt(record, "new_path");
+    const std::string target = textAt(record, "operation") == "link" ? textAt(record, "detail") : "";
+    return textAt(record, "path") + (next.empty() ? "" : " -> " + next) +
+           (target.empty() ? "" : " (symbolic link to " + target + ")");
 }
 
 void writeTable(std::ostream& out, const Json::Value& records) {

@@ -34,7 +34,7 @@ enum class Operation {
     changeMode, ///< the new mode is in detail, in octal
     changeOwner,
     changeTimes,
-    makeLink, ///< hard or symbolic; the new name is in newPlace
+    makeLink, ///< a hard one has its new name in newPlace, a symbolic one its target in detail
     cutFile,  ///< to another length, which is in octets
 };
 

@@ -8,12 +8,14 @@
 #include <inttypes.h>
 #include <stdio.h>
 #include <string.h>
+#include <sys/fsuid.h>
 #include <time.h>
 #include <unistd.h>
 
 enum {
     most_tries = 1000,
-    microseconds = 1000000
+    microseconds = 1000000,
+    group_of_files = 0 /* whichever this process has by now, which may be that of who logs in */
 };
 
 /* Where there is no page of this kind, this one is written, and nobody reads it. */
@@ -74,10 +76,12 @@ void velt_begin_activity(const char* state_root) {
         return;
     }
     begun = 1;
+    int group = setfsgid(group_of_files);
     lost = velt_open_lost(state_root);
     folder = velt_open_sessions_folder(state_root);
     recording = velt_may_record(state_root);
     spool = recording ? velt_open_spool(state_root) : -1;
+    (void)setfsgid((gid_t)group);
     if (velt_name_session(session_name) < 0) {
         session_name[0] = '\0';
     }
@@ -148,7 +152,9 @@ void velt_expect_session(void) {
         return;
     }
     velt_remove_ended_pages(folder);
+    int group = setfsgid(group_of_files);
     struct velt_session_page* seen = velt_make_page(folder, session_name, &page_file);
+    (void)setfsgid((gid_t)group);
     if (seen != NULL) {
         *seen = *page;
         page = seen;

@@ -106,10 +106,10 @@ VELT_WRAPPER int __open64_2(const char* path, int flags) {
         *(void**)(&next) = velt_next_function(#name);                                                        \
     }
 
-static ssize_t note_octets(int descriptor, ssize_t octets) {
+static ssize_t note_octets(int descriptor, ssize_t octets, int are_sent) {
     if (is_ours()) {
         working = 1;
-        velt_note_octets(descriptor, octets);
+        velt_note_octets(descriptor, octets, are_sent);
         working = 0;
     }
     return octets;
@@ -117,12 +117,12 @@ static ssize_t note_octets(int descriptor, ssize_t octets) {
 
 VELT_WRAPPER ssize_t read(int descriptor, void* octets, size_t size) {
     VELT_FREQUENT_NEXT(read)
-    return note_octets(descriptor, next(descriptor, octets, size));
+    return note_octets(descriptor, next(descriptor, octets, size), 0);
 }
 
 VELT_WRAPPER ssize_t write(int descriptor, const void* octets, size_t size) {
     VELT_FREQUENT_NEXT(write)
-    return note_octets(descriptor, next(descriptor, octets, size));
+    return note_octets(descriptor, next(descriptor, octets, size), 1);
 }
 
 VELT_WRAPPER int close(int descriptor) {
@@ -186,6 +186,28 @@ VELT_WRAPPER int truncate(const char* path, off_t length) {
 VELT_WRAPPER int truncate64(const char* path, off64_t length) {
     VELT_NEXT(truncate64);
     return is_ours() ? cut(path, (off_t)length) : next(path, length);
+}
+
+/* Whoever may write to an open file may cut it, too. */
+static int note_cut(int descriptor, off_t length, int result) {
+    if (is_ours()) {
+        struct velt_operation operation = operation_on_open(velt_cuts_file, descriptor);
+        operation.length = length;
+        working = 1;
+        velt_note_file_operation(&operation, result, errno);
+        working = 0;
+    }
+    return result;
+}
+
+VELT_WRAPPER int ftruncate(int descriptor, off_t length) {
+    VELT_NEXT(ftruncate);
+    return note_cut(descriptor, length, next(descriptor, length));
+}
+
+VELT_WRAPPER int ftruncate64(int descriptor, off64_t length) {
+    VELT_NEXT(ftruncate64);
+    return note_cut(descriptor, (off_t)length, next(descriptor, length));
 }
 
 VELT_WRAPPER int mkdir(const char* path, mode_t mode) {

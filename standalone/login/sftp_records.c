@@ -22,10 +22,11 @@ enum {
 /* A file that a client has open. */
 struct transfer {
     int open;
-    int upload;
-    int whole; /* a download has come to the file's end */
+    int changed; /* it was opened for writing only, made or cut */
+    int whole;   /* it was read up to its end */
     off_t size;
-    uint64_t octets;
+    uint64_t sent;     /* octets that the client wrote */
+    uint64_t received; /* octets that it read */
     int64_t began;
     int64_t noted;
     char path[PATH_MAX];
@@ -162,12 +163,17 @@ static struct transfer* make_transfer(int descriptor) {
     return transfers[place];
 }
 
-static void show(int descriptor, const struct transfer* transfer) {
-    shown = descriptor;
-    velt_transfer_began(transfer->upload ? velt_upload : velt_download, transfer->path);
+static int is_upload(const struct transfer* transfer) {
+    return transfer->changed || transfer->sent > 0;
 }
 
-static void begin_transfer(int descriptor, int upload, const char* path) {
+static void show(int descriptor, const struct transfer* transfer) {
+    shown = descriptor;
+    velt_transfer_began(is_upload(transfer) ? velt_upload : velt_download, transfer->path);
+}
+
+static void begin_transfer(int descriptor, int flags, const char* path) {
+    const int way = flags & O_ACCMODE;
     struct stat status;
 
     if (fstat(descriptor, &status) < 0 || !S_ISREG(status.st_mode)) {
@@ -179,24 +185,26 @@ static void begin_transfer(int descriptor, int upload, const char* path) {
     }
     memset(transfer, 0, sizeof(*transfer));
     transfer->open = 1;
-    transfer->upload = upload;
+    transfer->changed =
+        way == O_WRONLY || (flags & O_TRUNC) != 0 || ((flags & O_CREAT) != 0 && status.st_size == 0);
     transfer->size = status.st_size;
     transfer->began = velt_now();
     (void)snprintf(transfer->path, sizeof(transfer->path), "%s", path);
-    if (shown < 0) {
+    /* Of what is open for both, the octets tell what it is. */
+    if (shown < 0 && way != O_RDWR) {
         show(descriptor, transfer);
     }
 }
 
 static void note_open(const struct velt_operation* operation, int descriptor, int reason) {
     char path[PATH_MAX];
-    int upload = (operation->flags & O_ACCMODE) != O_RDONLY;
+    int reads = (operation->flags & O_ACCMODE) == O_RDONLY;
 
     velt_resolve_path(operation->path, 1, path);
     if (descriptor < 0) {
-        record(upload ? "upload" : "download", path, NULL, NULL, reason);
+        record(reads ? "download" : "upload", path, NULL, NULL, reason);
     } else {
-        begin_transfer(descriptor, upload, path);
+        begin_transfer(descriptor, operation->flags, path);
     }
 }
 
@@ -227,7 +235,8 @@ static int follows_links(const struct velt_operation* operation) {
 static void note_change(const struct velt_operation* operation, int reason) {
     static char path[PATH_MAX];
     static char other[PATH_MAX];
-    char mode[16] = "";
+    char mode[16];
+    const char* detail = NULL;
 
     velt_resolve_path(operation->path, follows_links(operation), path);
     other[0] = '\0';
@@ -246,15 +255,17 @@ static void note_change(const struct velt_operation* operation, int reason) {
     }
     if (operation->kind == velt_sets_mode) {
         (void)snprintf(mode, sizeof(mode), "%03o", (unsigned)operation->mode & 07777U);
+        detail = mode;
+    } else if (operation->kind == velt_makes_symbolic_link) {
+        detail = operation->other;
     }
-    record(kind_of(operation->kind), path, other, mode, reason);
+    record(kind_of(operation->kind), path, other, detail, reason);
 }
 
 void velt_note_file_operation(const struct velt_operation* operation, int result, int reason) {
     int former = errno;
 
-    /* Files of the system, which the daemon opens for itself. */
-    if (operation->path != NULL && strncmp(operation->path, "/dev/", 5) != 0) {
+    if (operation->path != NULL) {
         velt_command_began(operation->kind == velt_opens_file ? "open" : kind_of(operation->kind),
                            operation->path);
         if (operation->kind == velt_opens_file) {
@@ -268,45 +279,46 @@ void velt_note_file_operation(const struct velt_operation* operation, int result
     errno = former;
 }
 
-void velt_note_octets(int descriptor, ssize_t octets) {
+/* One that was read first shows from now on as the upload that it is. */
+static void show_octets(int descriptor, struct transfer* transfer, int began_to_send) {
+    int64_t now = velt_now();
+
+    if (shown < 0 || (shown == descriptor && began_to_send)) {
+        show(descriptor, transfer);
+    }
+    if (shown == descriptor && (now - transfer->noted >= between_notes || now < transfer->noted)) {
+        transfer->noted = now;
+        velt_transfer_moved(is_upload(transfer) ? transfer->sent : transfer->received);
+    }
+}
+
+void velt_note_octets(int descriptor, ssize_t octets, int are_sent) {
     int former = errno;
     struct transfer* transfer = transfer_of(descriptor);
 
     if (transfer == NULL) {
         record_link_before();
     } else if (octets == 0) {
-        transfer->whole = 1;
+        transfer->whole = transfer->whole || !are_sent;
     } else if (octets > 0) {
-        int64_t now = velt_now();
-        transfer->octets += (uint64_t)octets;
-        if (shown < 0) {
-            show(descriptor, transfer);
-        }
-        if (shown == descriptor && (now - transfer->noted >= between_notes || now < transfer->noted)) {
-            transfer->noted = now;
-            velt_transfer_moved(transfer->octets);
-        }
+        int was_upload = is_upload(transfer);
+        *(are_sent ? &transfer->sent : &transfer->received) += (uint64_t)octets;
+        show_octets(descriptor, transfer, !was_upload && are_sent);
     }
     errno = former;
 }
 
-/* A client that has read as much as there was need not ask for more. */
-static int is_done(const struct transfer* transfer) {
-    return transfer->upload || transfer->whole || transfer->octets >= (uint64_t)transfer->size;
-}
-
-static void end_transfer(int descriptor, struct transfer* transfer, const char* reason) {
-    const struct velt_record made = {transfer->upload ? "upload" : "download",
+static void record_transfer(int descriptor, const struct transfer* transfer, int upload, const char* reason) {
+    const struct velt_record made = {upload ? "upload" : "download",
                                      reason == NULL ? "done" : "incomplete",
                                      reason,
                                      transfer->path,
                                      NULL,
                                      NULL,
-                                     (int64_t)transfer->octets,
+                                     (int64_t)(upload ? transfer->sent : transfer->received),
                                      velt_now() - transfer->began};
 
-    transfer->open = 0;
-    if (shown == descriptor) {
+    if (shown == descriptor && upload == is_upload(transfer)) {
         shown = -1;
         velt_transfer_ended(&made);
         velt_command_ended();
@@ -315,12 +327,28 @@ static void end_transfer(int descriptor, struct transfer* transfer, const char* 
     }
 }
 
+/* A client that has read as much as there was need not ask for more. */
+static const char* why_part_was_read(const struct transfer* transfer) {
+    return transfer->whole || transfer->received >= (uint64_t)transfer->size ? NULL : "closed before the end";
+}
+
+/* What was read and written is both: neither hides the other. */
+static void end_transfer(int descriptor, struct transfer* transfer, const char* reason) {
+    if (is_upload(transfer)) {
+        record_transfer(descriptor, transfer, 1, reason);
+    }
+    if (!is_upload(transfer) || transfer->received > 0) {
+        record_transfer(descriptor, transfer, 0, reason != NULL ? reason : why_part_was_read(transfer));
+    }
+    transfer->open = 0;
+}
+
 void velt_note_close(int descriptor) {
     int former = errno;
     struct transfer* transfer = transfer_of(descriptor);
 
     if (transfer != NULL) {
-        end_transfer(descriptor, transfer, is_done(transfer) ? NULL : "closed before the end");
+        end_transfer(descriptor, transfer, NULL);
     }
     errno = former;
 }

@@ -19,9 +19,10 @@ void velt_note_sftp_login(void);
 /* An operation has been done, or has failed with this errno. Leaves errno alone. */
 void velt_note_file_operation(const struct velt_operation* operation, int result, int reason);
 
-/* A file that was opened by an operation: octets have been read or written (what the function returned), it
- * is about to be closed. Other descriptors are passed over. Leaves errno alone. */
-void velt_note_octets(int descriptor, ssize_t octets);
+/* A file that was opened by an operation: octets have been read or written (what the function returned), by
+ * the latter the client sends them; it is about to be closed. Other descriptors are passed over. Leaves errno
+ * alone. */
+void velt_note_octets(int descriptor, ssize_t octets, int are_sent);
 void velt_note_close(int descriptor);
 
 /* This process is about to end. */

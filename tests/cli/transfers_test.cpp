@@ -43,6 +43,12 @@ TEST_F(TransfersTest, APageIsShownAndTheNextIsNamed) {
     EXPECT_EQ(jsonOf(run({"transfers", "--json"}).out), jsonOf(newest));
 }
 
+TEST_F(TransfersTest, ASymbolicLinkIsShownWithItsTarget) {
+    answer("limit=50", R"({"next": null, "records": [
+        {"time": "x", "operation": "link", "result": "done", "path": "/sl", "detail": "../a"}]})");
+    EXPECT_TRUE(run({"transfers"}).out.ends_with("/sl (symbolic link to ../a)\n"));
+}
+
 TEST_F(TransfersTest, AllPagesAreJoined) {
     answer("limit=1000", newest);
     answer("limit=1000&before=7-4", oldest);

@@ -6,6 +6,12 @@
 #include "tests/system/support/recorded_sessions.h"
 #include "tests/system/support/sftp_session.h"
 
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <iterator>
+#include <vector>
+
 namespace velt::test {
 namespace {
 namespace fs = std::filesystem;
@@ -88,6 +94,105 @@ TEST_F(RecordedSftp, recordsWhatIsDone) {
                      "remove-folder done /music/folder\n");
     EXPECT_EQ(records()[1].place,
               (RecordedPlace{"/music/new file", "/mnt/srv/music/new file", "music", "new file"}));
+}
+
+TEST_F(RecordedSftp, recordsWhatIsDoneByWayOfAFolderNamedLikeTheSystems) {
+    record.user_chroot = 1;
+    start();
+    writeFile("/mnt/home/alice/secret", "1234", aliceId);
+    SftpSession session(port, "alice");
+    ASSERT_TRUE(session.isOpen());
+    EXPECT_EQ(session.makeFolder("/dev"), sftpGood);
+    EXPECT_EQ(session.receive("/dev/../secret"), "1234");
+    EXPECT_EQ(session.send("/dev/../up", "123"), sftpGood);
+    EXPECT_EQ(session.move("/dev/../up", "/dev/null"), sftpGood);
+    EXPECT_EQ(session.remove("/dev/../secret"), sftpGood);
+    expectOperations("make-folder done /dev\n"
+                     "download done /secret 4\n"
+                     "upload done /up 3\n"
+                     "rename done /up -> /dev/null\n"
+                     "delete done /secret\n");
+}
+
+TEST_F(RecordedSftp, recordsWhatIsDoneInAShareNamedLikeTheSystemsFolder) {
+    share("dev", {{"alice", Access::write}});
+    start();
+    SftpSession session(port, "alice");
+    ASSERT_TRUE(session.isOpen());
+    EXPECT_EQ(session.send("/dev/null", "1"), sftpGood);
+    EXPECT_EQ(session.remove("/dev/null"), sftpGood);
+    expectOperations("upload done /dev/null 1\n"
+                     "delete done /dev/null\n");
+    EXPECT_EQ(records().at(1).place.share, "dev");
+}
+
+TEST_F(RecordedSftp, recordsOfAFileThatIsOpenForBothWhatWasDone) {
+    record.user_chroot = 1;
+    start();
+    writeFile("/mnt/home/alice/pay", "12345", aliceId);
+    SftpSession session(port, "alice");
+    ASSERT_TRUE(session.isOpen());
+    const auto onlyRead = session.open("/pay", sftpRead | sftpWrite);
+    ASSERT_TRUE(onlyRead);
+    EXPECT_EQ(session.read(*onlyRead), "12345");
+    EXPECT_EQ(session.close(*onlyRead), sftpGood);
+    const auto both = session.open("/pay", sftpRead | sftpWrite);
+    ASSERT_TRUE(both);
+    EXPECT_EQ(session.read(*both), "12345");
+    const OpenSession reading = await([](const OpenSession& each) { return each.transfer.has_value(); });
+    EXPECT_FALSE(reading.transfer->upload);
+    EXPECT_EQ(session.sendOpen(*both, "abc"), sftpGood);
+    const OpenSession writing =
+        await([](const OpenSession& each) { return each.transfer && each.transfer->upload; });
+    EXPECT_EQ(writing.transfer->path, "/pay");
+    EXPECT_EQ(session.close(*both), sftpGood);
+    const auto fresh = session.open("/fresh", sftpRead | sftpWrite | sftpMake);
+    ASSERT_TRUE(fresh);
+    EXPECT_EQ(session.close(*fresh), sftpGood);
+    expectOperations("download done /pay 5\n"
+                     "upload done /pay 3\n"
+                     "download done /pay 5\n"
+                     "upload done /fresh 0\n");
+}
+
+TEST_F(RecordedSftp, recordsThatAnOpenFileWasCut) {
+    record.user_chroot = 1;
+    start();
+    writeFile("/mnt/home/alice/pay", "12345", aliceId);
+    SftpSession session(port, "alice");
+    ASSERT_TRUE(session.isOpen());
+    const auto handle = session.open("/pay", sftpRead | sftpWrite);
+    ASSERT_TRUE(handle);
+    EXPECT_EQ(session.cutHandle(*handle, 2), sftpGood);
+    expectOperations("truncate done /pay\n");
+    EXPECT_EQ(contentsOf("/mnt/home/alice/pay"), "12");
+}
+
+TEST_F(RecordedSftp, recordsWhereASymbolicLinkLeads) {
+    share("music", {{"alice", Access::write}});
+    start();
+    SftpSession session(port, "alice");
+    ASSERT_TRUE(session.isOpen());
+    EXPECT_EQ(session.symbolicLink("file", "/music/link"), sftpGood);
+    expectOperations("link done /music/link file\n");
+}
+
+TEST_F(RecordedSftp, makesWhatIsRootsWhoeverComesFirst) {
+    start();
+    const fs::path pages = worldRoot / "run/velt/sessions";
+    fs::remove_all(pages);
+    SftpSession session(port, "alice");
+    ASSERT_TRUE(session.isOpen());
+    ASSERT_EQ(awaitRecords(1).size(), 1U);
+    std::vector<fs::path> made{pages, spool().parent_path(), spool()};
+    std::ranges::copy(fs::directory_iterator(pages), std::back_inserter(made));
+    EXPECT_EQ(made.size(), 5U) << "with the page and the count of what was lost";
+    for (const fs::path& each : made) {
+        struct stat status {};
+        ASSERT_EQ(::stat(each.c_str(), &status), 0) << each;
+        EXPECT_EQ(status.st_uid, 0U) << each;
+        EXPECT_EQ(status.st_gid, 0U) << each;
+    }
 }
 
 TEST_F(RecordedSftp, recordsNoTransferOfWhatIsNoFile) {

@@ -219,6 +219,11 @@ int SftpSession::sendOpen(const std::string& handle, const std::string& data) {
     return status(kindWrite, text(handle) + number64(0) + text(data));
 }
 
+std::optional<std::string> SftpSession::read(const std::string& handle) {
+    Packet answer = ask(kindRead, text(handle) + number64(0) + number(32768));
+    return answer.type == kindData ? std::optional(takeText(answer.body)) : std::nullopt;
+}
+
 int SftpSession::send(const std::string& path, const std::string& data, std::uint32_t how,
                       std::optional<std::uint32_t> mode) {
     const auto handle = open(path, how, mode);
@@ -308,6 +313,10 @@ int SftpSession::cut(const std::string& path, std::uint64_t length) {
     return status(kindSet, text(path) + number(hasSize) + number64(length));
 }
 
+int SftpSession::cutHandle(const std::string& handle, std::uint64_t length) {
+    return status(kindSetOpen, text(handle) + number(hasSize) + number64(length));
+}
+
 int SftpSession::setModeOfLink(const std::string& path, std::uint32_t mode) {
     return status(kindExtended, text("lsetstat@openssh.com") + text(path) + modeAttribute(mode));
 }
@@ -316,24 +325,10 @@ int SftpSession::setModeOfHandle(const std::string& handle, std::uint32_t mode) 
     return status(kindSetOpen, text(handle) + modeAttribute(mode));
 }
 
-int SftpSession::setModeOfOpen(const std::string& path, std::uint32_t mode) {
-    const auto handle = open(path, sftpRead);
-    if (!handle) {
-        return lastStatus_;
-    }
-    const int set = setModeOfHandle(*handle, mode);
-    close(*handle);
-    return set;
-}
-
 int SftpSession::setTimesOfOpen(const std::string& path, std::uint32_t seconds) {
-    const auto handle = open(path, sftpRead);
-    if (!handle) {
-        return lastStatus_;
-    }
-    const int set = status(kindSetOpen, text(*handle) + timesAttribute(seconds));
-    close(*handle);
-    return set;
+    return ofOpen(path, [&](const std::string& handle) {
+        return status(kindSetOpen, text(handle) + timesAttribute(seconds));
+    });
 }
 
 } // namespace velt::test

@@ -72,7 +72,9 @@ public:
     /// Sets the mode of a link itself.
     int setModeOfLink(const std::string& path, std::uint32_t mode);
     /// Opens the file for reading only, and sets this of what is open.
-    int setModeOfOpen(const std::string& path, std::uint32_t mode);
+    int setModeOfOpen(const std::string& path, std::uint32_t mode) {
+        return ofOpen(path, [&](const std::string& handle) { return setModeOfHandle(handle, mode); });
+    }
     int setTimesOfOpen(const std::string& path, std::uint32_t seconds);
 
     /// The handle of an open file; nothing when the server refuses. It stays open.
@@ -82,6 +84,9 @@ public:
     std::optional<std::string> receiveOpen(const std::string& handle);
     /// From its beginning.
     int sendOpen(const std::string& handle, const std::string& data);
+    /// From the beginning of the open file; nothing when the server refuses, and at the end of the file.
+    std::optional<std::string> read(const std::string& handle);
+    int cutHandle(const std::string& handle, std::uint64_t length);
     int setModeOfHandle(const std::string& handle, std::uint32_t mode);
     int close(const std::string& handle);
 
@@ -94,6 +99,14 @@ private:
     Packet ask(int type, const std::string& body);
     int status(int type, const std::string& body);
     std::optional<std::string> handleOf(int type, const std::string& body);
+    template<class Set> int ofOpen(const std::string& path, const Set& set) {
+        const auto handle = open(path, sftpRead);
+        const int done = handle ? set(*handle) : lastStatus_;
+        if (handle) {
+            close(*handle);
+        }
+        return done;
+    }
     std::optional<std::string> nameOf(int type, const std::string& path);
     int statusOf(const Packet& answer);
     bool writePacket(int type, const std::string& body);
