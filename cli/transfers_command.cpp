@@ -66,14 +66,16 @@ std::string pathOfPage(const TransferOptions& options) {
 
 std::string resultOf(const Json::Value& record) {
     const std::string reason = textAt(record, "reason");
-    return textAt(record, "result") + (reason.empty() ? "" : ": " + reason);
+    const std::string more = record["left_out"].isIntegral() ? displayValue(record["left_out"]) : "";
+    return textAt(record, "result") + (reason.empty() ? "" : ": " + reason) +
+           (more.empty() ? "" : " (after " + more + " refused ones without a record)");
 }
 
 std::string placesOf(const Json::Value& record) {
     const std::string next = textAt(record, "new_path");
     const std::string target = textAt(record, "operation") == "link" ? textAt(record, "detail") : "";
-    return textAt(record, "path") + (next.empty() ? "" : " -> " + next) +
-           (target.empty() ? "" : " (symbolic link to " + target + ")");
+    return textAt(record, "path") + (record["cut"].isBool() ? "..." : "") +
+           (next.empty() ? "" : " -> " + next) + (target.empty() ? "" : " (symbolic link to " + target + ")");
 }
 
 void writeTable(std::ostream& out, const Json::Value& records) {

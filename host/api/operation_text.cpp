@@ -34,7 +34,7 @@ struct Column {
 
 using Record = OperationRecord;
 
-constexpr std::array<Column, 25> columns{{
+constexpr std::array<Column, 27> columns{{
     {"time", [](const Record& record) { return Json::Value(timestamp(record.time)); }},
     {"operation",
      [](const Record& record) { return Json::Value(std::string(operationName(record.operation))); }},
@@ -65,6 +65,11 @@ constexpr std::array<Column, 25> columns{{
          return record.duration ? Json::Value(Json::Int64{record.duration->count()}) : Json::Value();
      }},
     {"rate", rateOf},
+    {"left_out",
+     [](const Record& record) {
+         return record.leftOut > 0 ? Json::Value(Json::UInt64{record.leftOut}) : Json::Value();
+     }},
+    {"cut", [](const Record& record) { return record.cut ? Json::Value(true) : Json::Value(); }},
     {"escaped", [](const Record& record) { return record.escaped ? Json::Value(true) : Json::Value(); }},
 }};
 

@@ -30,6 +30,7 @@ constexpr std::chrono::milliseconds betweenTakes{200};
 constexpr std::chrono::seconds betweenLooks{1};
 constexpr std::chrono::seconds betweenTrims{60};
 constexpr std::chrono::seconds afterProblem{2};
+constexpr int mostTrims = 20; ///< before more is taken
 
 class Subscribers {
 public:
@@ -121,7 +122,7 @@ private:
     Clock::duration round();
     Result<> open();
     Result<bool> take();
-    Result<> trim();
+    Result<bool> trim();
     std::vector<Activity> lookAtPages();
     void tellRunning(const std::vector<Activity>& running);
     void tell(const OperationRecord& record);
@@ -146,6 +147,7 @@ private:
     std::set<std::pair<std::string, std::int64_t>> taken_; ///< the records of this round
     Clock::time_point nextLook_;
     Clock::time_point nextTrim_;
+    OperationLimits limits_; ///< as they were at the last trim
 };
 
 Reader& reader() {
@@ -187,17 +189,24 @@ Result<bool> Reader::take() {
         tell(record);
     }
     log(taken.records);
-    if (Clock::now() >= nextTrim_) {
-        VELT_RETURN_IF_ERROR(trim());
+    bool trims = Clock::now() >= nextTrim_;
+    if (!trims && !taken.records.empty()) {
+        VELT_ASSIGN_OR_RETURN(trims, store_->isFull(limits_.size));
     }
-    return taken.more;
+    VELT_ASSIGN_OR_RETURN(const bool more, trims ? trim() : Result<bool>(false));
+    return taken.more || more;
 }
 
-Result<> Reader::trim() {
+/// Removes more than one round takes, so that no flood outgrows the limit. True when it has not finished.
+Result<bool> Reader::trim() {
     VELT_ASSIGN_OR_RETURN(const auto settings, loadActivitySettings());
-    VELT_ASSIGN_OR_RETURN(const bool more, store_->trim(settings.limits, std::chrono::system_clock::now()));
-    nextTrim_ = Clock::now() + (more ? Clock::duration(betweenTakes) : Clock::duration(betweenTrims));
-    return {};
+    limits_ = settings.limits;
+    bool more = true;
+    for (int i = 0; i < mostTrims && more; ++i) {
+        VELT_ASSIGN_OR_RETURN(more, store_->trim(limits_, std::chrono::system_clock::now()));
+    }
+    nextTrim_ = Clock::now() + (more ? Clock::duration(0) : Clock::duration(betweenTrims));
+    return more;
 }
 
 /// Others read that log; what fails there keeps nothing from the store.

@@ -72,7 +72,7 @@ bool EndedSession::write(std::uint32_t number, const std::vector<velt_member>& o
     };
     members.insert(members.end(), own.begin(), own.end());
     std::array<char, velt_longest_line> line{};
-    const std::size_t length = velt_make_line(line.data(), members.data(), members.size());
+    const std::size_t length = velt_make_line(line.data(), members.data(), members.size(), velt_longest_text);
     return velt_write_spool(spool_.get(), line.data(), length) == 0;
 }
 
@@ -104,12 +104,14 @@ bool EndedSession::recordEnd() {
     const std::string why = reason();
     const std::uint64_t in = page_.transfer == velt_upload ? page_.transfer_octets : 0;
     const std::uint64_t out = page_.transfer == velt_download ? page_.transfer_octets : 0;
-    return write(velt_closing_record, {{"kind", "session-closed", 0},
-                                       {"result", "done", 0},
-                                       {"reason", why.c_str(), 0},
-                                       {"in", nullptr, static_cast<std::int64_t>(page_.octets_in + in)},
-                                       {"out", nullptr, static_cast<std::int64_t>(page_.octets_out + out)},
-                                       {"duration", nullptr, between(page_.since, page_.active)}});
+    return write(velt_closing_record,
+                 {{"kind", "session-closed", 0},
+                  {"result", "done", 0},
+                  {"reason", why.c_str(), 0},
+                  {"in", nullptr, static_cast<std::int64_t>(page_.octets_in + in)},
+                  {"out", nullptr, static_cast<std::int64_t>(page_.octets_out + out)},
+                  {"duration", nullptr, between(page_.since, page_.active)},
+                  {"leftout", nullptr, page_.left_out > 0 ? std::int64_t{page_.left_out} : -1}});
 }
 
 } // namespace

@@ -7,7 +7,7 @@
 namespace velt {
 namespace {
 
-constexpr int firstText = 12; ///< parameter
+constexpr int firstText = 14; ///< parameter
 constexpr int ahead = 2;      ///< columns of a row before the operation's own, parameters count from 1
 
 template<class Record> auto textsOf(Record& record) {
@@ -54,7 +54,10 @@ void bindOperation(Statement& statement, const OperationRecord& record, std::int
                                                     signedOf(record.octetsIn),
                                                     signedOf(record.octetsOut),
                                                     durationOf(record),
-                                                    record.escaped ? Number(1) : std::nullopt};
+                                                    record.escaped ? Number(1) : std::nullopt,
+                                                    record.leftOut > 0 ? signedOf(record.leftOut)
+                                                                       : std::nullopt,
+                                                    record.cut ? Number(1) : std::nullopt};
     int parameter = 1;
     for (const Number& number : numbers) {
         statement.bind(parameter++, number);
@@ -63,6 +66,14 @@ void bindOperation(Statement& statement, const OperationRecord& record, std::int
         // A text that is empty takes no room.
         statement.bind(parameter++, text->empty() ? std::nullopt : std::optional(*text));
     }
+}
+
+std::size_t textOctets(const OperationRecord& record) {
+    std::size_t octets = 0;
+    for (const std::string* const text : textsOf(record)) {
+        octets += text->size();
+    }
+    return octets;
 }
 
 OperationRecord readOperation(Statement& row) {
@@ -81,6 +92,8 @@ OperationRecord readOperation(Statement& row) {
         record.duration = std::chrono::microseconds(*duration);
     }
     record.escaped = row.number(ahead + 10) != 0;
+    record.leftOut = countAt(row, ahead + 11).value_or(0);
+    record.cut = row.number(ahead + 12) != 0;
     int column = ahead + firstText - 1;
     for (std::string* const text : textsOf(record)) {
         *text = row.text(column++);

@@ -85,7 +85,9 @@ struct OperationRecord {
     std::optional<std::uint64_t> octetsIn;             ///< of a session that closed: uploaded,
     std::optional<std::uint64_t> octetsOut;            ///< and downloaded
     std::optional<std::chrono::microseconds> duration; ///< of a transfer or session
+    std::uint64_t leftOut = 0; ///< refused operations of the session since its last record that have none
     bool escaped = false;
+    bool cut = false; ///< texts were too long, and are not whole
 };
 
 } // namespace velt

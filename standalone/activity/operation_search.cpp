@@ -131,6 +131,38 @@ Result<OperationPage> run(sqlite3* database, const OperationFilter& filter) {
     return page;
 }
 
+Result<std::vector<std::string>> losers(sqlite3* database, std::chrono::system_clock::time_point since) {
+    Statement query;
+    std::vector<std::string> names;
+    int result = query.prepare(database, "SELECT name FROM holder WHERE early >= ?1 ORDER BY name");
+    if (result == SQLITE_OK) {
+        query.bind(1, microsecondsOf(since));
+        for (result = query.step(); result == SQLITE_ROW; result = query.step()) {
+            names.push_back(query.text(0));
+        }
+    }
+    return result == SQLITE_DONE
+               ? Result<std::vector<std::string>>(names)
+               : databaseError(database, statePath(paths::operationDatabase), "read", operationStoreTitle);
+}
+
+/// By a connection of its own; nothing is found where there is no store.
+template<class Found, class Find> Result<Found> inStore(const Find& find) {
+    const auto path = statePath(paths::operationDatabase);
+    if (!fileExists(path)) {
+        return Found();
+    }
+    sqlite3* opened = nullptr;
+    const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
+    const int result = sqlite3_open_v2(path.c_str(), &opened, flags, nullptr);
+    const DatabaseOwner database(opened);
+    if (result != SQLITE_OK) {
+        return databaseError(opened, path, "opened", operationStoreTitle);
+    }
+    sqlite3_busy_timeout(opened, busyMilliseconds);
+    return find(opened);
+}
+
 } // namespace
 
 std::string keyText(const OperationKey& key) {
@@ -148,19 +180,11 @@ std::optional<OperationKey> parseOperationKey(std::string_view text) {
 }
 
 Result<OperationPage> searchOperations(const OperationFilter& filter) {
-    const auto path = statePath(paths::operationDatabase);
-    if (!fileExists(path)) {
-        return OperationPage();
-    }
-    sqlite3* opened = nullptr;
-    const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
-    const int result = sqlite3_open_v2(path.c_str(), &opened, flags, nullptr);
-    const DatabaseOwner database(opened);
-    if (result != SQLITE_OK) {
-        return databaseError(opened, path, "opened", operationStoreTitle);
-    }
-    sqlite3_busy_timeout(opened, busyMilliseconds);
-    return run(opened, filter);
+    return inStore<OperationPage>([&](sqlite3* database) { return run(database, filter); });
+}
+
+Result<std::vector<std::string>> losersOfRecords(std::chrono::system_clock::time_point since) {
+    return inStore<std::vector<std::string>>([&](sqlite3* database) { return losers(database, since); });
 }
 
 } // namespace velt

@@ -51,6 +51,10 @@ struct OperationPage {
 /// so a long search holds up nobody; thread-safe.
 Result<OperationPage> searchOperations(const OperationFilter& filter);
 
+/// Who lost records before their age at this moment or later, for want of room, by operation_room.h; sorted.
+/// Nobody without a store. Thread-safe.
+Result<std::vector<std::string>> losersOfRecords(std::chrono::system_clock::time_point since);
+
 } // namespace velt
 
 #endif

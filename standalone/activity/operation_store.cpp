@@ -1,6 +1,7 @@
 #include "standalone/activity/operation_store.h"
 
 #include "standalone/activity/operation_columns.h"
+#include "standalone/activity/operation_room.h"
 #include "standalone/core/error_number.h"
 
 #include <algorithm>
@@ -11,8 +12,7 @@ namespace velt {
 namespace {
 
 // The version of these tables, kept in the database itself.
-constexpr std::int64_t formVersion = 1;
-constexpr int mostRemovedAtOnce = 5000;
+constexpr std::int64_t formVersion = 2;
 
 constexpr const char* tableSql = R"(
     CREATE TABLE session (id INTEGER PRIMARY KEY, name TEXT NOT NULL UNIQUE);
@@ -20,10 +20,10 @@ constexpr const char* tableSql = R"(
         id INTEGER PRIMARY KEY AUTOINCREMENT,
         time INTEGER NOT NULL, session INTEGER NOT NULL, number INTEGER NOT NULL, operation INTEGER NOT NULL,
         result INTEGER NOT NULL, protocol INTEGER NOT NULL, octets INTEGER, octetsin INTEGER, octetsout INTEGER,
-        duration INTEGER, escaped INTEGER, reason TEXT, user TEXT, account TEXT, address TEXT, detail TEXT,
+        duration INTEGER, escaped INTEGER, leftout INTEGER, cut INTEGER, reason TEXT, user TEXT, account TEXT, address TEXT, detail TEXT,
         path TEXT, server TEXT, share TEXT, within TEXT, newpath TEXT, newserver TEXT, newshare TEXT,
         newwithin TEXT);
-    CREATE UNIQUE INDEX operation_number ON operation (session, number);
+    CREATE UNIQUE INDEX operation_number ON operation (session, number, time, operation);
     CREATE INDEX operation_time ON operation (time);
     CREATE INDEX operation_user ON operation (user, time);
     CREATE INDEX operation_share ON operation (share, time);
@@ -34,7 +34,15 @@ constexpr const char* tableSql = R"(
     CREATE INDEX operation_incomplete ON operation (time) WHERE result = 1;
     CREATE INDEX operation_refused ON operation (time) WHERE result = 2;
     CREATE TABLE spool (inode INTEGER PRIMARY KEY, taken INTEGER NOT NULL);
-    PRAGMA user_version = 1;
+    PRAGMA user_version = 2;
+)";
+
+constexpr const char* fromFirstFormSql = R"(
+    ALTER TABLE operation ADD COLUMN leftout INTEGER;
+    ALTER TABLE operation ADD COLUMN cut INTEGER;
+    DROP INDEX operation_number;
+    CREATE UNIQUE INDEX operation_number ON operation (session, number, time, operation);
+    PRAGMA user_version = 2;
 )";
 
 std::string insertSql() {
@@ -42,15 +50,14 @@ std::string insertSql() {
     for (int i = 1; i <= operationColumnCount; ++i) {
         parameters += (i == 1 ? "?" : ", ?") + std::to_string(i);
     }
-    // What a crash or a second attempt would store twice is there already.
+    // What a crash or a second attempt would store twice is there already. One that has but the number of
+    // another is another one: nobody keeps a record out by taking its number before.
     return std::string("INSERT OR IGNORE INTO operation (") + operationColumns + ") VALUES (" + parameters +
            ")";
 }
 
-/// The oldest, whatever their age, or those before a moment.
-std::string removeSql(bool whatever) {
-    return std::string("DELETE FROM operation WHERE id IN (SELECT id FROM operation WHERE ") +
-           (whatever ? "?1 IS NOT NULL" : "time < ?1") + " ORDER BY time LIMIT ?2)";
+std::int64_t microsecondsOf(std::chrono::system_clock::time_point time) {
+    return std::chrono::floor<std::chrono::microseconds>(time.time_since_epoch()).count();
 }
 
 } // namespace
@@ -78,7 +85,9 @@ Result<std::unique_ptr<OperationStore>> OperationStore::open(const std::filesyst
     std::unique_ptr<OperationStore> store(new OperationStore(path));
     VELT_ASSIGN_OR_RETURN(store->database_, openDatabase(path, operationStoreTitle));
     // What has been taken over is removed from the spool, so it must not be lost with the power either.
-    if (execute(store->database_.get(), "PRAGMA synchronous = FULL") != SQLITE_OK) {
+    // The log counts as room of the store, too.
+    if (execute(store->database_.get(), "PRAGMA synchronous = FULL; PRAGMA journal_size_limit = 32000000") !=
+        SQLITE_OK) {
         return store->cannotBe("opened");
     }
     VELT_RETURN_IF_ERROR(store->makeTables());
@@ -97,12 +106,13 @@ Result<> OperationStore::makeTables() {
     }
     const std::int64_t found = version.number(0);
     version.reset();
-    if (found != 0 && found != formVersion) {
+    if (found < 0 || found > formVersion) {
         return Error(ErrorNumber::log, std::string(operationStoreTitle) + " " + path_.string() +
                                            " has format " + std::to_string(found) +
                                            ", which this version does not know.");
     }
-    if (found == 0 && execute(database, tableSql) != SQLITE_OK) {
+    if (found < formVersion && (execute(database, found == 0 ? tableSql : fromFirstFormSql) != SQLITE_OK ||
+                                execute(database, roomTableSql().c_str()) != SQLITE_OK)) {
         return rollBack("made");
     }
     return execute(database, "COMMIT") == SQLITE_OK ? Result<>() : rollBack("made");
@@ -189,6 +199,9 @@ Result<std::vector<OperationRecord>> OperationStore::take(std::int64_t spool, st
     }
     int result = insertAll(records);
     if (result == SQLITE_DONE) {
+        result = countAdded(database_.get(), records);
+    }
+    if (result == SQLITE_DONE) {
         statements_->setTaken.bind(1, spool);
         statements_->setTaken.bind(2, upTo);
         result = statements_->setTaken.run();
@@ -207,6 +220,12 @@ Result<> OperationStore::forget(std::int64_t spool) {
     return statements_->forget.run() == SQLITE_DONE ? Result<>() : cannotBe("written");
 }
 
+std::int64_t OperationStore::logOctets() const {
+    std::error_code error;
+    const auto size = std::filesystem::file_size(path_.string() + "-wal", error);
+    return error ? 0 : static_cast<std::int64_t>(size);
+}
+
 Result<std::int64_t> OperationStore::usedOctets() {
     Statement query;
     // The file itself does not shrink; what is free in it is used again.
@@ -219,26 +238,56 @@ Result<std::int64_t> OperationStore::usedOctets() {
     return query.number(0);
 }
 
-Result<bool> OperationStore::trim(const OperationLimits& limits, std::chrono::system_clock::time_point now) {
+/// Room is kept for what is taken before the next look.
+Result<bool> OperationStore::isFull(std::int64_t size) {
+    constexpr std::int64_t mostKept = 32'000'000;
+    const std::int64_t most = size - std::min(size / 10, mostKept);
     VELT_ASSIGN_OR_RETURN(const std::int64_t used, usedOctets());
-    const bool tooLarge = limits.size > 0 && used > limits.size;
-    const auto oldest = std::chrono::floor<std::chrono::microseconds>((now - limits.age).time_since_epoch());
-    Statement remove;
-    if (remove.prepare(database_.get(), removeSql(tooLarge).c_str()) != SQLITE_OK) {
-        return cannotBe("written");
+    if (size == 0 || used + logOctets() <= most) {
+        return false;
     }
-    remove.bind(1, limits.age.count() > 0 ? oldest.count() : 0);
-    remove.bind(2, std::int64_t{mostRemovedAtOnce});
-    if (remove.run() != SQLITE_DONE) {
-        return cannotBe("written");
+    // What is in the log is in the database afterwards, if nobody reads it just now.
+    execute(database_.get(), "PRAGMA wal_checkpoint(TRUNCATE)");
+    return used + std::min(logOctets(), size / 4) > most;
+}
+
+Result<int> OperationStore::removeOld(const OperationLimits& limits,
+                                      std::chrono::system_clock::time_point now) {
+    if (limits.age.count() == 0) {
+        return 0;
     }
-    const bool more = sqlite3_changes(database_.get()) == mostRemovedAtOnce;
+    const int removed = removeBefore(database_.get(), microsecondsOf(now - limits.age));
+    return removed >= 0 ? Result<int>(removed) : cannotBe("written");
+}
+
+Result<int> OperationStore::removeMost(const OperationLimits& limits,
+                                       std::chrono::system_clock::time_point now) {
+    const auto loser = loserOfRecords(database_.get());
+    if (!loser) {
+        return 0;
+    }
+    const auto early = limits.age.count() > 0 ? std::optional(microsecondsOf(now)) : std::nullopt;
+    const int removed = removeOf(database_.get(), *loser, early);
+    return removed >= 0 ? Result<int>(std::max(removed, 1)) : cannotBe("written");
+}
+
+Result<bool> OperationStore::trim(const OperationLimits& limits, std::chrono::system_clock::time_point now) {
+    VELT_ASSIGN_OR_RETURN(int removed, removeOld(limits, now));
+    if (removed == 0) {
+        VELT_ASSIGN_OR_RETURN(const bool full, isFull(limits.size));
+        if (full) {
+            VELT_ASSIGN_OR_RETURN(removed, removeMost(limits, now));
+        } else if (settleGrowth(database_.get()) != SQLITE_DONE) {
+            return cannotBe("written");
+        }
+    }
     // Numbers of sessions grow, and so, but for long sessions, do those of their operations.
-    if (execute(database_.get(), "DELETE FROM session WHERE id < (SELECT MIN(session) FROM operation)") !=
-        SQLITE_OK) {
+    if (removed > 0 &&
+        execute(database_.get(), "DELETE FROM session WHERE id < (SELECT MIN(session) FROM operation)") !=
+            SQLITE_OK) {
         return cannotBe("written");
     }
-    return more || tooLarge;
+    return removed > 0;
 }
 
 } // namespace velt

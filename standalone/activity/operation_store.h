@@ -18,7 +18,7 @@ namespace velt {
 /// How much is kept; 0: without a limit.
 struct OperationLimits {
     std::chrono::days age{90};
-    std::int64_t size = 1'000'000'000; ///< octets of the database
+    std::int64_t size = 1'000'000'000; ///< octets of the database with its log
 };
 
 /// Not thread-safe. Others may search meanwhile.
@@ -38,8 +38,12 @@ public:
     /// Forgets a spool that is about to be removed.
     Result<> forget(std::int64_t spool);
 
-    /// Removes a part of what is beyond the limits, the oldest first; true when there is more of it.
+    /// Removes a part of what is beyond the limits: what is too old, and of what is too much the oldest of
+    /// who loses records by operation_room.h. True when there may be more of it.
     Result<bool> trim(const OperationLimits& limits, std::chrono::system_clock::time_point now);
+
+    /// Whether the database is beyond this size, or nearly; never with 0.
+    Result<bool> isFull(std::int64_t size);
 
 private:
     explicit OperationStore(std::filesystem::path path) : path_(std::move(path)) {}
@@ -50,7 +54,10 @@ private:
     int insert(OperationRecord& record, bool& isNew);
     int sessionOf(const OperationRecord& record, std::int64_t& session);
     Result<> rollBack(const char* what);
+    std::int64_t logOctets() const;
     Result<std::int64_t> usedOctets();
+    Result<int> removeOld(const OperationLimits& limits, std::chrono::system_clock::time_point now);
+    Result<int> removeMost(const OperationLimits& limits, std::chrono::system_clock::time_point now);
 
     struct Statements;
     struct CloseStatements {

@@ -14,6 +14,7 @@ struct line {
     size_t length;
     int escaped;
     size_t longest_text;
+    int cut;
     int too_long;
 };
 
@@ -111,9 +112,11 @@ static size_t append_character(struct line* line, const char* text) {
 
 static void append_text(struct line* line, const char* text) {
     append(line, "\"", 1);
-    for (size_t taken = 0; text[taken] != '\0' && taken < line->longest_text;) {
+    size_t taken = 0;
+    while (text[taken] != '\0' && taken < line->longest_text) {
         taken += append_character(line, text + taken);
     }
+    line->cut |= text[taken] != '\0';
     append(line, "\"", 1);
 }
 
@@ -156,17 +159,17 @@ static void append_end(struct line* line, const char* text) {
     line->length += strlen(text);
 }
 
-size_t velt_make_line(char text[velt_longest_line], const struct velt_member* members, size_t count) {
-    struct line line = {text, 0, !all_utf8(members, count), velt_longest_line, 0};
+size_t velt_make_line(char text[velt_longest_line], const struct velt_member* members, size_t count,
+                      size_t longest) {
+    struct line line = {text, 0, !all_utf8(members, count), longest, 0, 0};
 
     append_all(&line, members, count);
-    int cut = line.too_long;
-    if (cut) {
+    if (line.too_long) {
         line.longest_text = length_when_cut;
         append_all(&line, members, count);
     }
     append_end(&line, line.escaped ? ",\"escaped\":1" : "");
-    append_end(&line, cut ? ",\"cut\":1" : "");
+    append_end(&line, line.cut ? ",\"cut\":1" : "");
     append_end(&line, "}\n");
     return line.length;
 }

@@ -12,6 +12,7 @@ extern "C" {
 
 enum {
     velt_longest_line = 16384,
+    velt_longest_text = velt_longest_line, /* where none is to be cut that fits */
     velt_record_separator = 0x1e
 };
 
@@ -26,9 +27,10 @@ struct velt_member {
  * negative is left out.
  *
  * Texts may hold any octets. Where one of them is not UTF-8, all are written with '%' and each octet of what
- * is not UTF-8 as "%XX", and the object has "escaped": 1. Where the line would be too long, the texts are cut
- * to 250 octets, and it has "cut": 1. */
-size_t velt_make_line(char line[velt_longest_line], const struct velt_member* members, size_t count);
+ * is not UTF-8 as "%XX", and the object has "escaped": 1. Texts of more than `longest` octets are cut to
+ * that, or to 250 where the line would be too long, and it has "cut": 1. */
+size_t velt_make_line(char line[velt_longest_line], const struct velt_member* members, size_t count,
+                      size_t longest);
 
 /* The length of the UTF-8 character that the text begins with, 0 when that is none, also at its end. */
 size_t velt_character_length(const char* text);

@@ -15,7 +15,10 @@
 enum {
     most_tries = 1000,
     microseconds = 1000000,
-    group_of_files = 0 /* whichever this process has by now, which may be that of who logs in */
+    between_refused = microseconds / 5,
+    most_refused_at_once = 10,
+    longest_refused = 1024, /* octets of a text */
+    group_of_files = 0      /* whichever this process has by now, which may be that of who logs in */
 };
 
 /* Where there is no page of this kind, this one is written, and nobody reads it. */
@@ -100,22 +103,25 @@ static const char* protocol_name(void) {
 }
 
 /* What every record says, and then what this one does. */
-static void write_record(const struct velt_member* own, size_t count, uint32_t number) {
+static void write_record(const struct velt_member* own, size_t count, uint32_t number, size_t longest) {
     static char line[velt_longest_line];
     struct velt_member members[32] = {
         {"time", NULL, velt_now()},       {"session", session_name, 0}, {"number", NULL, number},
         {"protocol", protocol_name(), 0}, {"user", page->user, 0},      {"account", page->account, 0},
         {"address", page->address, 0},
     };
-    const size_t common = 7;
+    const size_t common = 8;
 
     if (!recording) {
         return;
     }
+    uint32_t left_out = __atomic_exchange_n(&page->left_out, 0, __ATOMIC_RELAXED);
+    members[7] = (struct velt_member){"leftout", NULL, left_out > 0 ? (int64_t)left_out : -1};
     memcpy(members + common, own, count * sizeof(*own));
-    size_t length = velt_make_line(line, members, common + count);
+    size_t length = velt_make_line(line, members, common + count, longest);
     if (spool < 0 || velt_write_spool(spool, line, length) < 0) {
         velt_count_lost(lost, velt_now());
+        (void)__atomic_add_fetch(&page->left_out, left_out, __ATOMIC_RELAXED);
     }
 }
 
@@ -144,7 +150,7 @@ void velt_login_was_refused(const struct velt_session* session, const char* kind
         {"reason", or_empty(kind), 0},
         {"detail", page->security, 0},
     };
-    write_record(members, sizeof(members) / sizeof(members[0]), take_number());
+    write_record(members, sizeof(members) / sizeof(members[0]), take_number(), velt_longest_text);
 }
 
 void velt_expect_session(void) {
@@ -173,7 +179,7 @@ void velt_session_opened(const struct velt_session* session) {
         {"result", "done", 0},
         {"detail", page->security, 0},
     };
-    write_record(members, sizeof(members) / sizeof(members[0]), take_number());
+    write_record(members, sizeof(members) / sizeof(members[0]), take_number(), velt_longest_text);
 }
 
 void velt_share_session(void) {
@@ -211,7 +217,7 @@ static void record_end(const char* reason) {
         {"out", NULL, (int64_t)(page->octets_out + running_octets(velt_download))},
         {"duration", NULL, velt_now() - page->since},
     };
-    write_record(members, sizeof(members) / sizeof(members[0]), velt_closing_record);
+    write_record(members, sizeof(members) / sizeof(members[0]), velt_closing_record, velt_longest_text);
 }
 
 void velt_session_closed(const char* reason) {
@@ -283,10 +289,42 @@ void velt_transfer_moved(uint64_t octets) {
     end_change();
 }
 
+/* Each refused operation takes its time from a stock that fills up again, for all processes of the session. A
+ * clock that was set back finds it full. */
+static int may_record_refused(void) {
+    const int64_t now = velt_now();
+    const int64_t most = (int64_t)most_refused_at_once * between_refused;
+    int64_t until = __atomic_load_n(&page->refused_until, __ATOMIC_RELAXED);
+    int64_t next = 0;
+
+    do {
+        next = (until > now && until <= now + most ? until : now) + between_refused;
+        if (next > now + most) {
+            return 0;
+        }
+    } while (!__atomic_compare_exchange_n(&page->refused_until, &until, next, 0, __ATOMIC_RELAXED,
+                                          __ATOMIC_RELAXED));
+    return 1;
+}
+
+/* Who has nothing to lose may have as many operations refused as there is time for. Once the session is
+ * closed, no record would say how many were left out. */
+static int is_left_out(int refused) {
+    if (!refused || page->closed || may_record_refused()) {
+        return 0;
+    }
+    (void)__atomic_add_fetch(&page->left_out, 1, __ATOMIC_RELAXED);
+    return 1;
+}
+
 static void write_operation(const struct velt_record* record, uint32_t number) {
     static struct velt_shown_place place;
     static struct velt_shown_place new_place;
+    int refused = strcmp(record->result, "refused") == 0;
 
+    if (is_left_out(refused)) {
+        return;
+    }
     velt_find_shown_place(or_empty(record->path), &place);
     velt_find_shown_place(or_empty(record->new_path), &new_place);
     const struct velt_member members[] = {
@@ -305,7 +343,8 @@ static void write_operation(const struct velt_record* record, uint32_t number) {
         {"octets", NULL, record->octets},
         {"duration", NULL, record->duration},
     };
-    write_record(members, sizeof(members) / sizeof(members[0]), number);
+    write_record(members, sizeof(members) / sizeof(members[0]), number,
+                 refused ? longest_refused : velt_longest_text);
 }
 
 static void add_octets(const struct velt_record* record) {

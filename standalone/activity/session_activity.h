@@ -76,7 +76,9 @@ void velt_transfer_moved(uint64_t octets);
 /* Records the transfer that the page shows, and shows it no more. */
 void velt_transfer_ended(const struct velt_record* record);
 
-/* Records an operation, or a transfer that the page does not show. */
+/* Records an operation, or a transfer that the page does not show. Of operations that are refused, a session
+ * has records of ten at once, and of five a second from then on; how many were left out says its next record.
+ */
 void velt_record_operation(const struct velt_record* record);
 
 /* Microseconds since 1970. */

@@ -74,7 +74,10 @@ struct velt_session_page {
     /* Written by who ends the session, before it does. */
     char ended_by[128];
     char end_reason[256];
-    char reserved[200];
+    int64_t refused_until; /* of the rate at which refused operations are recorded: when it has rested */
+    uint32_t left_out;     /* refused operations that no record has told of yet */
+    uint32_t unused_too;
+    char reserved[184];
 };
 
 /* "1z4-8rd2k-0f3a9c21": this process, the time of its start and the boot, so that no other session ever has

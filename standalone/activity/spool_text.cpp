@@ -48,12 +48,14 @@ void readTexts(const Json::Value& object, OperationRecord& record) {
     record.place = placeOf(object, "");
     record.newPlace = placeOf(object, "new");
     record.escaped = numberOf(object, "escaped").value_or(0) != 0;
+    record.cut = numberOf(object, "cut").value_or(0) != 0;
 }
 
 void readNumbers(const Json::Value& object, OperationRecord& record) {
     record.octets = countOf(object, "octets");
     record.octetsIn = countOf(object, "in");
     record.octetsOut = countOf(object, "out");
+    record.leftOut = countOf(object, "leftout").value_or(0);
     if (const auto duration = numberOf(object, "duration"); isTime(duration)) {
         record.duration = std::chrono::microseconds(*duration);
     }

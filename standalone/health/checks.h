@@ -38,7 +38,8 @@ Findings changeFindings();
 /// nevertheless.
 Findings journalFindings(TimePoint now);
 
-/// What sessions did and nobody can look up: records that were lost, or that cannot be taken over.
+/// What sessions did and nobody can look up: records that were lost, that cannot be taken over, or that were
+/// removed before their age.
 Findings activityFindings(TimePoint now);
 
 /// Services that run, and do not greet or take up TLS as their clients expect, or serve a certificate other

@@ -49,6 +49,16 @@ TEST_F(TransfersTest, ASymbolicLinkIsShownWithItsTarget) {
     EXPECT_TRUE(run({"transfers"}).out.ends_with("/sl (symbolic link to ../a)\n"));
 }
 
+TEST_F(TransfersTest, WhatIsNotWholeAndWhatHasNoRecordIsSaid) {
+    answer("limit=50", R"({"next": null, "records": [
+        {"time": "x", "operation": "delete", "result": "refused", "reason": "denied", "path": "/long", "cut": true,
+         "left_out": 412}]})");
+    const std::string out = run({"transfers"}).out;
+    EXPECT_TRUE(out.ends_with("  /long...\n")) << out;
+    EXPECT_NE(out.find("refused: denied (after 412 refused ones without a record)"), std::string::npos)
+        << out;
+}
+
 TEST_F(TransfersTest, AllPagesAreJoined) {
     answer("limit=1000", newest);
     answer("limit=1000&before=7-4", oldest);

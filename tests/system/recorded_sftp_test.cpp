@@ -226,6 +226,30 @@ TEST_F(RecordedSftp, recordsWhatIsRefused) {
                      "download refused /films/none (No such file or directory)\n");
 }
 
+TEST_F(RecordedSftp, recordsHowManyWereRefused) {
+    constexpr std::size_t many = 300;
+    share("films", {{"alice", Access::read}});
+    start();
+    {
+        SftpSession session(port, "alice");
+        ASSERT_TRUE(session.isOpen());
+        for (std::size_t i = 0; i < many; ++i) {
+            EXPECT_EQ(session.remove("/films/file"), sftpDenied);
+        }
+    }
+    const auto closed = [] {
+        const auto all = records();
+        return !all.empty() && all.back().operation == Operation::sessionClosed;
+    };
+    EXPECT_TRUE(waitUntil(closed, patience));
+    std::size_t told = 0;
+    for (const OperationRecord& each : records()) {
+        told += each.leftOut + (each.result == OperationResult::refused ? 1 : 0);
+    }
+    EXPECT_EQ(told, many);
+    EXPECT_LT(records().size(), many);
+}
+
 TEST_F(RecordedSftp, recordsTransfersThatEndBeforeTheirEnd) {
     record.user_chroot = 1;
     start();

@@ -19,7 +19,7 @@ using velt::host::toJson;
 constexpr const char* titles =
     "time,operation,result,reason,protocol,user,account,address,session,number,path,server_path,share,"
     "share_path,new_path,new_server_path,new_share,new_share_path,detail,octets,octets_in,octets_out,"
-    "duration_us,rate,escaped\r\n";
+    "duration_us,rate,left_out,cut,escaped\r\n";
 
 class HostTransfers : public HostTest {
 protected:
@@ -70,6 +70,8 @@ TEST_F(HostTransfers, TellAllOfARecord) {
     rename.newPlace = {"/docs/%FF", "/srv/docs/%FF", "docs", "%FF"};
     rename.detail = "x";
     rename.escaped = true;
+    rename.cut = true;
+    rename.leftOut = 7;
     OperationRecord closed;
     closed.operation = Operation::sessionClosed;
     closed.octetsIn = 5;
@@ -102,6 +104,8 @@ TEST_F(HostTransfers, TellAllOfARecord) {
     expectedRename["new_share_path"] = "%FF";
     expectedRename["detail"] = "x";
     expectedRename["escaped"] = true;
+    expectedRename["cut"] = true;
+    expectedRename["left_out"] = 7;
     EXPECT_EQ(toJson(page["records"][1]), toJson(expectedRename));
     EXPECT_EQ(page["records"][2]["octets_in"], 5);
     EXPECT_EQ(page["records"][2]["octets_out"], 0);

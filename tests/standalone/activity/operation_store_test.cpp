@@ -75,6 +75,8 @@ TEST_F(OperationStoreTest, GivesBackAllOfARecord) {
     all.octetsOut = 3;
     all.duration = microseconds(4);
     all.escaped = true;
+    all.leftOut = 6;
+    all.cut = true;
     add({all});
     const auto page = searchOperations({});
     ASSERT_EQ(page.valueOr({}).records.size(), 1U) << test::messageOf(page);
@@ -85,8 +87,10 @@ TEST_F(OperationStoreTest, GivesBackAllOfARecord) {
         std::tie(all.time, all.operation, all.result, all.reason, all.session, all.number, all.protocol));
     EXPECT_EQ(std::tie(read.user, read.account, read.address, read.place, read.newPlace, read.detail),
               std::tie(all.user, all.account, all.address, all.place, all.newPlace, all.detail));
-    EXPECT_EQ(std::tie(read.octets, read.octetsIn, read.octetsOut, read.duration, read.escaped),
-              std::tie(all.octets, all.octetsIn, all.octetsOut, all.duration, all.escaped));
+    EXPECT_EQ(
+        std::tie(read.octets, read.octetsIn, read.octetsOut, read.duration, read.escaped, read.leftOut,
+                 read.cut),
+        std::tie(all.octets, all.octetsIn, all.octetsOut, all.duration, all.escaped, all.leftOut, all.cut));
 }
 
 TEST_F(OperationStoreTest, FindsNewestFirst) {
@@ -159,12 +163,39 @@ TEST_F(OperationStoreTest, KnowsWhatIsStored) {
     EXPECT_EQ(store_->taken(7), 0);
 }
 
+TEST_F(OperationStoreTest, KeepsNoRecordOutWhoseNumberWasTakenBefore) {
+    OperationRecord forged = at(1, "anna", "forged");
+    OperationRecord real = at(2, "anna", "real");
+    real.number = forged.number;
+    add({forged});
+    EXPECT_EQ(store_->take(1, 2, {real}).valueOr({}).size(), 1U);
+    EXPECT_EQ(found({}), "/real /forged");
+}
+
+TEST_F(OperationStoreTest, TakesOverTheFirstForm) {
+    add({at(1, "anna", "a")});
+    store_.reset();
+    sqlite3* database = nullptr;
+    ASSERT_EQ(sqlite3_open(path_.c_str(), &database), SQLITE_OK);
+    const DatabaseOwner owner(database);
+    ASSERT_EQ(execute(database, "DROP TABLE holder; DROP INDEX operation_nobody; DROP INDEX operation_number;"
+                                "ALTER TABLE operation DROP COLUMN leftout;"
+                                "ALTER TABLE operation DROP COLUMN cut;"
+                                "CREATE UNIQUE INDEX operation_number ON operation (session, number);"
+                                "PRAGMA user_version = 1"),
+              SQLITE_OK);
+    SetUp();
+    add({at(2, "anna", "b")});
+    EXPECT_EQ(found({}), "/b /a");
+}
+
 TEST_F(OperationStoreTest, RemovesWhatIsTooOld) {
     const auto now = OperationRecord::TimePoint(std::chrono::days(100));
     const auto day = [](int number) {
         return std::chrono::floor<microseconds>(std::chrono::days(number)).count();
     };
     add({at(day(9), "anna", "a"), at(day(11), "anna", "b")});
+    EXPECT_EQ(store_->trim({std::chrono::days(90), 0}, now), true);
     EXPECT_EQ(store_->trim({std::chrono::days(90), 0}, now), false);
     EXPECT_EQ(found({}), "/b");
     EXPECT_EQ(store_->trim({std::chrono::days(0), 0}, now), false);

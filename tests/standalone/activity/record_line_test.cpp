@@ -12,9 +12,9 @@
 namespace velt {
 namespace {
 
-std::string lineOf(const std::vector<velt_member>& members) {
+std::string lineOf(const std::vector<velt_member>& members, std::size_t longest = velt_longest_text) {
     std::array<char, velt_longest_line> line{};
-    return {line.data(), velt_make_line(line.data(), members.data(), members.size())};
+    return {line.data(), velt_make_line(line.data(), members.data(), members.size(), longest)};
 }
 
 /// A record with this path.
@@ -73,6 +73,15 @@ TEST(RecordLine, CutsNamesThatFillIt) {
         lineOf({{"kind", "upload", 0}, {"path", path.c_str(), 0}, {"octets", nullptr, 7}});
     EXPECT_LT(line.size(), 2000U);
     EXPECT_TRUE(line.ends_with(",\"octets\":7,\"cut\":1}\n")) << line;
+}
+
+TEST(RecordLine, CutsWhatIsLongerThanItMay) {
+    const std::vector<velt_member> members{{"path", "/abc", 0}, {"octets", nullptr, 7}};
+    EXPECT_EQ(lineOf(members, 4), "\x1e{\"path\":\"/abc\",\"octets\":7}\n");
+    EXPECT_EQ(lineOf(members, 3), "\x1e{\"path\":\"/ab\",\"octets\":7,\"cut\":1}\n");
+    EXPECT_EQ(lineOf({{"path", "/\u00fc", 0}, {"kind", "x", 0}}, 2),
+              "\x1e{\"path\":\"/\u00fc\",\"kind\":\"x\"}\n")
+        << "no character is cut in two";
 }
 
 TEST(RecordLine, HasRoomForTheLongestPaths) {

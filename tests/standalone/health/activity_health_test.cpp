@@ -1,9 +1,11 @@
 // What is found about the record of what sessions did.
 #include "standalone/activity/activity_reader.h"
+#include "standalone/activity/operation_store.h"
 #include "standalone/activity/spool.h"
 #include "standalone/core/paths.h"
 #include "tests/standalone/health/health_test.h"
 #include "tests/standalone/support/state_folder.h"
+#include "tests/support/result.h"
 #include "tests/support/run_program.h"
 #include "tests/support/waiting.h"
 
@@ -39,6 +41,27 @@ TEST_F(ActivityHealth, LostRecordsAreCountedForADay) {
     velt_count_lost(lost, time);
     EXPECT_TRUE(activityFindings(now_)[0].sentence.starts_with("2 records of "));
     EXPECT_EQ(activityFindings(now_ + std::chrono::hours(24)), Findings());
+}
+
+TEST_F(ActivityHealth, WhoLosesRecordsBeforeTheirAgeIsNamedForADay) {
+    auto store = OperationStore::open(statePath(paths::operationDatabase));
+    ASSERT_EQ(messageOf(store), "");
+    OperationRecord record;
+    record.time = now_;
+    record.session = "s";
+    record.user = "anna";
+    EXPECT_EQ(messageOf((*store)->take(1, 1, {record})), "");
+    EXPECT_EQ(activityFindings(now_), Findings());
+    EXPECT_EQ((*store)->trim({std::chrono::days(90), 1}, now_), true);
+    EXPECT_EQ(
+        activityFindings(now_),
+        (Findings{{"records-early", Severity::warning, "sessions",
+                   "Within this day, records of what sessions did were removed before their age, since they "
+                   "take more room than max_size_mb in " +
+                       (folder_.path() / "etc/velt/transfers.conf").string() + " allows: user anna.",
+                   "Raise max_size_mb or lower max_age_days there. To see what fills the room, run: veltctl "
+                   "transfers"}}));
+    EXPECT_EQ(activityFindings(now_ + std::chrono::hours(25)), Findings());
 }
 
 TEST_F(ActivityHealth, ADamagedStoreIsNamedAndItsCommandMendsThat) {
