@@ -201,7 +201,7 @@ TEST_F(HostTransfers, AreCsvWhereAskedFor) {
     EXPECT_EQ(answer.header("content-type"), "text/csv; charset=utf-8; header=present");
     EXPECT_EQ(answer.body, std::string(titles) +
                                "2027-01-15T08:00:00.123Z,upload,done,,sftp,anna,anna,192.0.2.1,s1,3,"
-                               "/docs/a,/srv/docs/a,docs,a,,,,,,3000000000,,,1500000,2000000000,\r\n");
+                               "/docs/a,/srv/docs/a,docs,a,,,,,,3000000000,,,1500000,2000000000,,,\r\n");
 }
 
 TEST_F(HostTransfers, ACsvCellIsQuotedWhereItHasTo) {
