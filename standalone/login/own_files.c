@@ -2,9 +2,9 @@
 
 #include "standalone/login/kept_objects.h"
 #include "standalone/login/own_names.h"
+#include "standalone/login/own_places.h"
 #include "standalone/login/way.h"
 
-#include <dirent.h>
 #include <errno.h>
 #include <fcntl.h>
 #include <limits.h>
@@ -16,8 +16,6 @@
 
 enum {
     most_homes = 2,
-    deepest = 4,          /* folders below one of the home's own, where links are looked for */
-    most_entries = 20000, /* that are looked at for that */
     folder_flags = O_PATH | O_DIRECTORY | O_CLOEXEC
 };
 
@@ -51,131 +49,13 @@ static const char* stem_of(const char* name, char* stem, size_t size) {
     return stem;
 }
 
-/* Keeps what stands at this place below the home, be it behind links. 1 when it is a folder that may hold
- * more of that, 0 when not, or -1 with errno. What cannot be reached is recognised by its name alone. Any
- * other failure may be over in a moment, and what it hid could be changed then. */
-static int keep_at(const struct home* home, const char* below) {
-    struct velt_way_end end;
-
-    if (velt_walk_way(home->path, below, NULL, &end) < 0) {
-        return is_out_of_reach(errno) ? 0 : -1;
-    }
-    if (end.exists && velt_is_around_home(&end.what)) {
-        return 0; /* a link to all of the home stands for none of its own files */
-    }
-    if (velt_walk_way(home->path, below, velt_keep_object, &end) < 0) {
-        return is_out_of_reach(errno) ? 0 : -1;
-    }
-    return end.exists ? S_ISDIR(end.what.st_mode) : velt_keep_absent(&end);
-}
-
-/* Whether the link stays within its folder, as far as its text tells. */
-static int leads_below(int folder, const char* name) {
-    char target[PATH_MAX];
-
-    ssize_t length = readlinkat(folder, name, target, sizeof(target) - 1);
-    if (length <= 0) {
-        return 0;
-    }
-    target[length] = '\0';
-    return target[0] != '/' && strncmp(target, "../", 3) != 0 && strcmp(target, "..") != 0;
-}
-
-static int is_link(int folder, const struct dirent* entry) {
-    struct stat status;
-
-    if (entry->d_type != DT_UNKNOWN) {
-        return entry->d_type == DT_LNK;
-    }
-    return fstatat(folder, entry->d_name, &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISLNK(status.st_mode);
-}
-
-/* Of a folder that is listed, what is done with an entry: 0, or -1 with errno. */
-struct listing {
-    const struct home* home;
-    const char* below; /* the home */
-    int depth;         /* of the folder; 0 is the home itself */
-    int* left;         /* entries that may still be looked at */
-};
-
-static int keep_listed(const struct listing* listing);
-
-/* What programs obey may be kept anywhere, such as on another disk. The rest of the dot names is kept for
- * caution, which is not to close folders that have other uses. */
-static int is_followed(const struct listing* listing, int folder, const struct dirent* entry) {
-    const int links = is_link(folder, entry);
-
-    if (listing->depth > 0) {
-        return links;
-    }
-    return velt_is_own_name(entry->d_name) &&
-           (velt_is_listed_own_name(entry->d_name) || !links || leads_below(folder, entry->d_name));
-}
-
-static int keep_entry(const struct listing* listing, int folder, const struct dirent* entry) {
-    char below[PATH_MAX];
-    const char* between = listing->below[0] == '\0' ? "" : "/";
-    int holds_more = listing->depth > 0 && entry->d_type == DT_DIR;
-
-    if (snprintf(below, sizeof(below), "%s%s%s", listing->below, between, entry->d_name) >=
-        (int)sizeof(below)) {
-        return 0;
-    }
-    if (is_followed(listing, folder, entry)) {
-        holds_more = keep_at(listing->home, below);
-    }
-    if (holds_more <= 0 || listing->depth == deepest ||
-        (listing->depth == 0 && !velt_is_listed_own_name(entry->d_name))) {
-        return holds_more < 0 ? -1 : 0;
-    }
-    struct listing deeper = {listing->home, below, listing->depth + 1, listing->left};
-    return keep_listed(&deeper);
-}
-
-/* The links in the home, and in what is known to be obeyed there. */
-static int keep_listed(const struct listing* listing) {
-    const struct dirent* entry = NULL;
-    int result = 0;
-
-    int folder = velt_open_way(listing->home->path, listing->below);
-    DIR* list = folder < 0 ? NULL : fdopendir(folder);
-    if (list == NULL) {
-        if (folder >= 0) {
-            leave(folder);
-        }
-        return errno == ENOENT || errno == ENOTDIR || is_out_of_reach(errno) ? 0 : -1;
-    }
-    for (errno = 0; result == 0 && *listing->left > 0 && (entry = readdir(list)) != NULL; errno = 0) {
-        (*listing->left)--;
-        if (strcmp(entry->d_name, ".") != 0 && strcmp(entry->d_name, "..") != 0) {
-            result = keep_entry(listing, folder, entry);
-        }
-    }
-    if (result == 0 && entry == NULL && errno != 0 && !is_out_of_reach(errno)) {
-        result = -1;
-    }
-    int reason = errno;
-    (void)closedir(list);
-    errno = reason;
-    return result;
-}
-
 static int keep_files(struct home* home) {
-    char stem[NAME_MAX + 1];
-    int left = most_entries;
-    struct listing all = {home, "", 0, &left};
     struct velt_way_end root; /* which is visited on no way */
+    const struct velt_way_step step = {&root.what, "", &root.what, 0, 0};
 
-    if (velt_walk_way("/", "", NULL, &root) < 0 || velt_keep_way_to_home(&root.what, 0) < 0 ||
-        velt_walk_way(home->path, "", velt_keep_way_to_home, &home->end) < 0) {
-        return -1;
-    }
-    for (const char* const* name = velt_own_names; home->end.exists && *name != NULL; name++) {
-        if (keep_at(home, stem_of(*name, stem, sizeof(stem))) < 0) {
-            return -1;
-        }
-    }
-    if (home->end.exists && keep_listed(&all) < 0) {
+    if (velt_walk_way("/", "", NULL, &root) < 0 || velt_keep_way_to_home(&step) < 0 ||
+        velt_walk_way(home->path, "", velt_keep_way_to_home, &home->end) < 0 ||
+        (home->end.exists && velt_keep_own_places(home->path) < 0)) {
         return -1;
     }
     home->is_known = 1;
@@ -287,11 +167,19 @@ static int keeps_in_root(int folder, const char* name, const struct stat* child)
     return name != NULL ? is_root_name(name) : stands_at(root_names, folder, child);
 }
 
+/* What is to be changed. */
+struct place {
+    const char* name;
+    int exists;
+    int whole_only; /* its content is to be changed, so that it counts what is kept as a whole */
+};
+
 /* One folder on the way up from a place: `name` is the place's name when this is its own folder, else NULL,
  * and `child` is the folder from which the way came. 1, 0 or -1 as below. */
-static int keeps(int folder, const struct stat* here, int at_root, const char* name,
-                 const struct stat* child) {
-    int result = name != NULL && velt_is_kept_absent(here, name);
+static int keeps(int folder, const struct stat* here, int at_root, const struct place* place,
+                 const char* name, const struct stat* child) {
+    int result = name != NULL ? velt_is_kept_name(here, name, place->exists, place->whole_only)
+                              : velt_is_kept_below(folder, here, child, place->whole_only);
 
     for (size_t i = 0; i < home_count && result == 0; i++) {
         const struct velt_way_end* end = &homes[i].end;
@@ -309,7 +197,8 @@ static int keeps(int folder, const struct stat* here, int at_root, const char* n
 }
 
 /* 1 when the place may not be changed, 0 when it may, -1 with errno. Closes the folder. */
-static int is_within_kept(int folder, const char* name) {
+static int is_within_kept(int folder, const struct place* place) {
+    const char* name = place->name;
     struct stat here;
     struct stat above;
     struct stat child;
@@ -323,7 +212,7 @@ static int is_within_kept(int folder, const char* name) {
         }
         int at_root = result == 0 && velt_is_same_object(&here, &above);
         if (result == 0) {
-            result = keeps(folder, &here, at_root, name, &child);
+            result = keeps(folder, &here, at_root, place, name, &child);
         }
         leave(folder);
         folder = up;
@@ -350,10 +239,11 @@ int velt_may_change(int folder, const char* name, enum velt_change change) {
     if (!exists && errno != ENOENT && !is_out_of_reach(errno)) {
         return -1;
     }
-    int refused = exists && velt_is_kept(&status, change == velt_changes_content);
+    const struct place place = {name, exists, change == velt_changes_content};
+    int refused = exists && velt_is_kept(&status, place.whole_only);
     if (!refused) {
         int copy = fcntl(folder, F_DUPFD_CLOEXEC, 0);
-        refused = copy < 0 ? -1 : is_within_kept(copy, name);
+        refused = copy < 0 ? -1 : is_within_kept(copy, &place);
     }
     if (refused > 0) {
         errno = EACCES;

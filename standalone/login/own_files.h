@@ -5,7 +5,7 @@
 
 /* Keeps such files of this home, and the home itself, as they are; where the home does not exist, it is not
  * made either. Called before the root directory changes, with the right to look everywhere. 0, or -1 with
- * errno. */
+ * errno; E2BIG when there is too much of it, as velt_crowded_place of own_places.h tells. */
 int velt_keep_home(const char* path);
 
 /* Keeps the files of what stands at the homes' paths by now: a home may have been made or exchanged since.

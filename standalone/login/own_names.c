@@ -1,9 +1,13 @@
 #include "standalone/login/own_names.h"
 
+#include <ctype.h>
 #include <string.h>
 #include <strings.h>
 
-static const char letters_and_digits[] = "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789";
+#define SMALL_LETTERS "abcdefghijklmnopqrstuvwxyz"
+
+static const char small_letters[] = SMALL_LETTERS;
+static const char letters_and_digits[] = SMALL_LETTERS "ABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789";
 
 const char* const velt_own_names[] = {
     /* who may log in */
@@ -87,6 +91,7 @@ const char* const velt_own_names[] = {
     ".vnc",
     ".xpra",
     "startwm.sh",
+    "GNUstep",
     ".xprofile",
     ".xsession",
     ".xsessionrc",
@@ -110,9 +115,13 @@ static const char* const harmless_names[] = {
 /* What clients have a file end with while they send it. */
 static const char* const temporary_ends[] = {".part", ".partial", ".filepart", ".tmp", ".temp", ".swp", NULL};
 
-/* Some file systems know no difference between small and capital letters. */
+/* Some file systems know no difference between small and capital letters. A home may hold very many names;
+ * most of those here differ from one in the second letter, before which none has a star. */
 static int is_in(const char* const* names, const char* name) {
     for (; *names != NULL; names++) {
+        if (name[0] == '\0' || tolower((unsigned char)(*names)[1]) != tolower((unsigned char)name[1])) {
+            continue;
+        }
         size_t length = strcspn(*names, "*");
         if (strncasecmp(*names, name, length) == 0 && ((*names)[length] == '*' || name[length] == '\0')) {
             return 1;
@@ -121,7 +130,8 @@ static int is_in(const char* const* names, const char* name) {
     return 0;
 }
 
-/* ".letter.txt.part", or as rsync has it ".letter.txt.Ab12Cd". */
+/* ".letter.txt.part", or as rsync has it ".letter.txt.Ab12Cd": six small letters are a word,
+ * ".profile.custom". */
 static int is_temporary(const char* name) {
     const char* end = strrchr(name, '.');
 
@@ -134,7 +144,8 @@ static int is_temporary(const char* name) {
         }
     }
     size_t length = strlen(end + 1);
-    return length == 6 && strspn(end + 1, letters_and_digits) == length;
+    return length == 6 && strspn(end + 1, letters_and_digits) == length &&
+           strspn(end + 1, small_letters) < length;
 }
 
 int velt_is_listed_own_name(const char* name) {

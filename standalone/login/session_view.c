@@ -3,6 +3,7 @@
 #include "standalone/login/access_files.h"
 #include "standalone/login/login_program.h"
 #include "standalone/login/own_files.h"
+#include "standalone/login/own_places.h"
 
 #include <errno.h>
 #include <pwd.h>
@@ -30,7 +31,8 @@ int velt_make_session_view(char* const arguments[velt_view_words], char* words, 
     } else if (isolated && unshare(CLONE_NEWNS) < 0) {
         (void)snprintf(words, size, "cannot make a mount namespace: %s", strerror(errno));
     } else if (!keep_homes(arguments[velt_view_home])) {
-        (void)snprintf(words, size, "cannot look at the home: %s", strerror(errno));
+        (void)snprintf(words, size, "cannot look at the home: %s",
+                       errno == E2BIG ? velt_crowded_place() : strerror(errno));
     } else if (velt_note_access_files(arguments[velt_view_state]) < 0) {
         (void)snprintf(words, size, "cannot look at the shares and rules: %s", strerror(errno));
     } else {

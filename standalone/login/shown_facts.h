@@ -25,8 +25,9 @@ public:
     /// The view shows this folder at `path`. What cannot be told is left out.
     void add(const std::string& path, const UniqueFd& folder);
 
-    /// The session may write to this folder, in which these rules of others may lead to folders: whoever
-    /// moved one of these, or one on the way to it, could put another in its place. See told_places.h.
+    /// The session may write to this folder, in or through which these rules of others may lead to folders:
+    /// whoever moved one of these, or one on the way to it, could put another in its place. Tells all of the
+    /// way, also what lies beside the folder. See told_places.h.
     Result<> addRuleFolders(const std::vector<ChrootRule>& rules, const UniqueFd& folder);
 
     /// Whether the session must know of the text.
@@ -37,8 +38,13 @@ public:
 private:
     void addFact(const std::string& kind, const std::string& name, const std::filesystem::path& place);
 
+    /// The way of this rule within the share, which lies in `folder` at `place` or around it.
+    Result<> addWayInShare(const UniqueFd& folder, const std::filesystem::path& place,
+                           const std::filesystem::path& share, const std::filesystem::path& below);
     Result<> addWay(const UniqueFd& folder, const std::filesystem::path& below);
-    void tell(const std::string& kind, const std::string& name, const struct stat& object);
+    /// One step of a way, and whether that is all of it.
+    Result<bool> addStep(const UniqueFd& folder, const std::string& name, mode_t& type);
+    void tell(const std::string& kind, const std::string& name, const std::string& place);
 
     const Grants& grants_;
     std::string text_;

@@ -3,9 +3,9 @@
 #include "standalone/login/kept_objects.h"
 
 #include <errno.h>
-#include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 /* Ends with an empty text, whatever the file holds. NULL with errno when it cannot be read. */
@@ -25,33 +25,34 @@ static char* read_whole(int file, size_t* size) {
     return text;
 }
 
-static int read_object(const char* text, struct stat* object) {
+/* The object that begins the text, and where it ends; NULL with errno when there is none. */
+static const char* read_object(const char* text, struct stat* object) {
     char* between = NULL;
     char* end = NULL;
 
     memset(object, 0, sizeof(*object));
     object->st_dev = strtoull(text, &between, 10);
     object->st_ino = strtoull(between, &end, 10);
-    if (between == text || end == between || *end != '\0') {
+    if (between == text || end == between || (*end != '\0' && *end != ' ')) {
         errno = EINVAL;
-        return -1;
+        return NULL;
     }
-    return 0;
+    return end;
 }
 
 static int keep_fact(const char* kind, const char* name, const char* place) {
-    struct velt_way_end end;
+    struct stat folder;
     struct stat object;
+    const int exists = strcmp(kind, "kept") == 0;
 
-    if (strcmp(kind, "kept") == 0) {
-        return read_object(place, &object) < 0 ? -1 : velt_keep_told_object(&object);
-    }
-    if (strcmp(kind, "absent") != 0) {
+    if (!exists && strcmp(kind, "absent") != 0) {
         return 0;
     }
-    memset(&end, 0, sizeof(end));
-    (void)snprintf(end.name, sizeof(end.name), "%s", name);
-    return read_object(place, &end.folder) < 0 ? -1 : velt_keep_told_absent(&end);
+    const char* rest = read_object(place, &folder);
+    if (rest == NULL || (exists && read_object(rest, &object) == NULL)) {
+        return -1;
+    }
+    return velt_keep_told_name(&folder, name, exists ? &object : NULL);
 }
 
 int velt_keep_told_places(int file) {

@@ -84,6 +84,14 @@ static int finish(const struct way* way, struct velt_way_end* end) {
     return fstat(way->folder, &end->what);
 }
 
+static int show(const struct way* way, velt_visit visit, const char* name, const struct stat* what,
+                int is_end) {
+    struct stat folder;
+    const struct velt_way_step step = {&folder, name, what, is_end, way->links};
+
+    return fstat(way->folder, &folder) < 0 ? -1 : visit(&step);
+}
+
 /* Goes on to the first name of what is left. 1 while there is more, else 0, or -1 with errno. */
 static int step(struct way* way, velt_visit visit, struct velt_way_end* end) {
     char name[NAME_MAX + 1];
@@ -102,7 +110,7 @@ static int step(struct way* way, velt_visit visit, struct velt_way_end* end) {
     if (fstatat(way->folder, name, &end->what, AT_SYMLINK_NOFOLLOW) < 0) {
         return stop(way, name, end);
     }
-    if (visit != NULL && visit(&end->what, *rest == '\0') < 0) {
+    if (visit != NULL && show(way, visit, name, &end->what, *rest == '\0') < 0) {
         return -1;
     }
     if (S_ISLNK(end->what.st_mode)) {
@@ -135,7 +143,7 @@ int velt_walk_way(const char* path, const char* below, velt_visit visit, struct 
     return more;
 }
 
-int velt_open_way(const char* path, const char* below) {
+int velt_open_way(const char* path, const char* below, int access) {
     char whole[PATH_MAX];
     struct open_how how;
 
@@ -144,7 +152,7 @@ int velt_open_way(const char* path, const char* below) {
         return -1;
     }
     memset(&how, 0, sizeof(how));
-    how.flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC | O_NONBLOCK;
+    how.flags = (unsigned long long)(access | O_DIRECTORY | O_CLOEXEC);
     how.resolve = RESOLVE_IN_ROOT | RESOLVE_NO_MAGICLINKS;
     /* The kernel gives up (EAGAIN) when folders are moved while it resolves the path. */
     for (int attempt = 0; attempt < 100; attempt++) {

@@ -12,9 +12,17 @@ struct velt_way_end {
     char name[NAME_MAX + 1]; /* and the name there at which no folder stands */
 };
 
-/* Told of each folder, file and link on the way; `is_end` at the last name, of a link's target too. 0, or -1
- * with errno, which ends the walk. */
-typedef int (*velt_visit)(const struct stat* object, int is_end);
+/* A folder, file or link on the way, found by this name. */
+struct velt_way_step {
+    const struct stat* folder; /* in which it lies */
+    const char* name;
+    const struct stat* what;
+    int is_end; /* at the last name, of a link's target too */
+    int links;  /* that have been followed before */
+};
+
+/* Told of each step. 0, or -1 with errno, which ends the walk. */
+typedef int (*velt_visit)(const struct velt_way_step* step);
 
 /* Begins all ways from now on at this process's root directory, whatever that becomes. 0, or -1 with errno.
  */
@@ -27,7 +35,8 @@ int velt_way_descriptor(void);
  * the end, or -1 with errno. */
 int velt_walk_way(const char* path, const char* below, velt_visit visit, struct velt_way_end* end);
 
-/* Opens the folder at the end of such a way for listing. A descriptor, or -1 with errno. */
-int velt_open_way(const char* path, const char* below);
+/* Opens the folder at the end of such a way, with O_PATH or for listing with O_RDONLY. A descriptor, or -1
+ * with errno. */
+int velt_open_way(const char* path, const char* below, int access);
 
 #endif

@@ -15,6 +15,18 @@ protected:
         fs::create_directories(folder);
         EXPECT_EQ(chown(folder.c_str(), aliceId, aliceId), 0);
     }
+    /// Has links in the home lead to what else lies there.
+    static void layLinks() {
+        for (const char* folder : {"dots/fish", "dots", ".ssh", ".config"}) {
+            makeFolder(home / folder);
+        }
+        for (const char* name : {"keys", "rc", "fish/config"}) {
+            writeFile(home / "dots" / name, name, aliceId);
+        }
+        fs::create_symlink("../dots/keys", home / ".ssh/authorized_keys");
+        fs::create_symlink("dots/rc", home / ".bashrc.local");
+        fs::create_directory_symlink("../dots/fish", home / ".config/fish");
+    }
     static void expectNoMove(FileClient& client, const std::string& from, const std::string& to) {
         EXPECT_FALSE(client.rename(from, to)) << from << " to " << to;
         EXPECT_FALSE(client.replace(from, to)) << from << " to " << to;
@@ -189,6 +201,71 @@ TEST_P(HomesOwnFiles, areThoseOfTheHomeOnly) {
     const auto session = logIn();
     EXPECT_TRUE(session->write("/.bashrc", "x")) << "a rule leads elsewhere than home";
     EXPECT_FALSE(session->write("/out/authorized_keys", "x"));
+}
+
+TEST_P(HomesOwnFiles, areKnownInAHomeThatHoldsManyFiles) {
+    layLinks();
+    for (int i = 0; i < 100001; i++) { // more than may be looked at
+        const std::string number = std::to_string(i);
+        writeFile(home / ("junk" + number), "", aliceId);
+        writeFile(home / ("._junk" + number), "", aliceId);
+    }
+    record.user_chroot = 1;
+    start();
+    const auto session = logIn();
+    for (const std::string name : {"keys", "rc"}) {
+        EXPECT_FALSE(session->write("/dots/" + name, "x")) << name;
+        EXPECT_EQ(contentsOf(home / "dots" / name), name);
+    }
+    EXPECT_FALSE(session->rename("/dots", "/away"));
+    EXPECT_TRUE(session->write("/dots/free", "x"));
+}
+
+TEST_P(HomesOwnFiles, keepALoginOutWhereTheyCannotAllBeLookedAt) {
+    makeFolder(home / ".config/crowded");
+    for (int i = 0; i < 100001; i++) {
+        writeFile(home / ".config/crowded" / std::to_string(i), "", aliceId);
+    }
+    record.user_chroot = 1;
+    start();
+    EXPECT_TRUE(isRefused("alice"));
+    EXPECT_TRUE(contains(DaemonProcess::output(), "more than 100000 entries in /mnt/home/alice/.config"))
+        << DaemonProcess::output();
+    EXPECT_FALSE(isRefused("bob"));
+    fs::remove_all(home / ".config");
+    EXPECT_FALSE(isRefused("alice"));
+}
+
+TEST_P(HomesOwnFiles, areKeptAsTheirOwnerSavesThem) {
+    layLinks();
+    record.user_chroot = 1;
+    start();
+    const auto session = logIn();
+    const auto expectKept = [&](const std::string& when) {
+        for (const std::string name : {"keys", "rc", "fish/config"}) {
+            EXPECT_FALSE(session->write("/dots/" + name, "x")) << name << when;
+            expectNoMove(*session, "/dots/" + name, "/away");
+            expectNoMove(*session, "/home-of", "/dots/" + name);
+        }
+        expectNoMove(*session, "/dots", "/away");
+    };
+    expectKept(" at first");
+    for (const char* name : {"keys", "rc"}) {
+        writeFile(home / "dots/new", name, aliceId);
+        fs::rename(home / "dots/new", home / "dots" / name);
+    }
+    fs::rename(home / "dots/fish", home / "dots/former");
+    makeFolder(home / "dots/fish");
+    writeFile(home / "dots/fish/config", "fish", aliceId);
+    expectKept(" when they are replaced");
+    EXPECT_TRUE(session->write("/dots/free", "x"));
+    fs::rename(home / "dots", home / "former");
+    fs::copy(home / "former", home / "dots", fs::copy_options::recursive);
+    for (const auto& entry : fs::recursive_directory_iterator(home / "dots")) {
+        EXPECT_EQ(chown(entry.path().c_str(), aliceId, aliceId), 0);
+    }
+    EXPECT_EQ(chown((home / "dots").c_str(), aliceId, aliceId), 0);
+    expectKept(" when the folder around them is exchanged");
 }
 
 VELT_OVER_EACH_PROTOCOL(HomesOwnFiles);

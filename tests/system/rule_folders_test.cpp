@@ -83,6 +83,61 @@ TEST_P(RuleFolders, areReachedByLinksThatStay) {
     EXPECT_FALSE(isRefused("bob"));
 }
 
+TEST_P(RuleFolders, areReachedByLinksThatLeadUpAndStay) {
+    makeFolder("deep", 0777);
+    makeFolder("real/end", 0777);
+    makeFolder("real", 0777);
+    fs::create_directory_symlink("../real", pub_ / "deep/link");
+    storeRules({"u:1002:/pub/deep/link/end"});
+    const auto alice = logIn();
+    for (const std::string folder : {"/pub/real/end", "/pub/real", "/pub/deep/link", "/pub/deep"}) {
+        expectToStay(*alice, folder, "/pub/away");
+    }
+    EXPECT_FALSE(isRefused("bob"));
+}
+
+TEST_P(RuleFolders, areReachedByLinksFromBesideTheView) {
+    makeFolder("sub/real", 0777);
+    makeFolder("sub", 0777);
+    makeFolder("deep", 0755);
+    fs::create_directory_symlink("../sub/real", pub_ / "deep/link");
+    storeRules({"u:1001:/pub/sub", "u:1002:/pub/deep/link"});
+    const auto alice = logIn();
+    expectToStay(*alice, "/real", "/away");
+    EXPECT_TRUE(alice->makeFolder("/free"));
+    EXPECT_FALSE(isRefused("bob"));
+}
+
+TEST_P(RuleFolders, stayWhenOthersExchangeThem) {
+    const auto alice = logIn();
+    for (const char* const folder : {"a/x", "a"}) {
+        fs::rename(pub_ / folder, pub_ / "former");
+        makeFolder("a/x", 0777);
+        makeFolder("a", 0777);
+        for (const std::string name : {"/pub/a/x", "/pub/a"}) {
+            expectToStay(*alice, name, "/pub/away");
+        }
+        EXPECT_TRUE(alice->write("/pub/a/x/new", "x")) << "what is in it is free";
+        fs::remove_all(pub_ / "former");
+    }
+}
+
+TEST_P(RuleFolders, stayWhenTheyAreMadeLater) {
+    storeRules({"u:1002:/pub/later/y/z"});
+    const auto alice = logIn();
+    makeFolder("later/y/z", 0777);
+    makeFolder("later/y", 0777);
+    makeFolder("later", 0777);
+    for (const std::string folder : {"/pub/later/y/z", "/pub/later/y", "/pub/later"}) {
+        expectToStay(*alice, folder, "/pub/away");
+    }
+    fs::remove(pub_ / "later/y/z");
+    EXPECT_FALSE(alice->rename("/pub/dept", "/pub/later/y/z"));
+    EXPECT_FALSE(alice->replace("/pub/dept", "/pub/later/y/z"));
+    EXPECT_FALSE(alice->makeFolder("/pub/later/y/z"));
+    EXPECT_TRUE(alice->write("/pub/later/y/new", "x"));
+}
+
 VELT_OVER_EACH_PROTOCOL(RuleFolders);
 
 } // namespace
