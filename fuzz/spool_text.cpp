@@ -27,7 +27,7 @@ void checkWriting(const std::string& name) {
                                               {"time", nullptr, 1},
                                               {"number", nullptr, 1}}};
     std::array<char, velt_longest_line> line{};
-    const std::size_t length = velt_make_line(line.data(), members.data(), members.size());
+    const std::size_t length = velt_make_line(line.data(), members.data(), members.size(), velt_longest_text);
     const auto read = velt::parseSpool({line.data(), length});
     check(read.records.size() == 1 && read.damaged == 0 && read.taken == length, "a name makes one record");
 }
