@@ -53,8 +53,10 @@ TEST_F(HostPlan, holdsForEachFieldOfTheDocument) {
           R"({"security": {"enable_umask": false}})",
           R"({"sftp": {"enable": true}})",
           R"({"sftp": {"portnum": 2017}})",
+          R"({"confinement": {"sftp": false}})",
+          R"({"confinement": {"sftp": true}})",
           R"({"chroot_rules": [{"type": "user", "name": "alice", "path": "/public"}]})",
-          R"({"ftp": null, "security": null, "sftp": null, "chroot_rules": null})"}) {
+          R"({"ftp": null, "security": null, "sftp": null, "confinement": null, "chroot_rules": null})"}) {
         expectAsPlanned(body);
     }
     const Json::Value openApi = curl("/openapi.json").json;
