@@ -113,10 +113,12 @@ Lines sentencesOfModules() {
 
 /// How a plan calls the file; "" for one that no plan mentions.
 std::string subjectOf(const std::string& file) {
-    static const std::map<std::string, std::string> subjects{{"etc/velt/ftp.conf", "ftp settings"},
-                                                             {"etc/velt/sftp.conf", "sftp settings"},
-                                                             {"etc/velt/chroot_rules", "chroot rules"},
-                                                             {"etc/veltinfo.conf", "system information"}};
+    static const std::map<std::string, std::string> subjects{
+        {"etc/velt/ftp.conf", "ftp settings"},
+        {"etc/velt/sftp.conf", "sftp settings"},
+        {"etc/velt/confinement.conf", "confinement settings"},
+        {"etc/velt/chroot_rules", "chroot rules"},
+        {"etc/veltinfo.conf", "system information"}};
     const auto known = subjects.find(file);
     if (known != subjects.end()) {
         return known->second;
@@ -236,7 +238,7 @@ Json::Value changesBetween(const SystemMoment& before, const SystemMoment& after
         }
     };
     compare("/chroot_rules", before.settings["chroot_rules"], after.settings["chroot_rules"]);
-    for (const char* section : {"security", "ftp", "sftp"}) {
+    for (const char* section : {"confinement", "security", "ftp", "sftp"}) {
         const Json::Value& former = before.settings[section];
         for (const std::string& key : former.getMemberNames()) {
             compare("/" + std::string(section) + "/" + key, former[key], after.settings[section][key]);
