@@ -221,7 +221,7 @@ TEST_F(KeyProgramFaults, TellNoKeyOfAFormerAccount) {
     sweep.prepare = [] {};
     sweep.act = [this] { return tellKeys({root_.path()}); };
     sweep.counts = callsOf("velt-authorized-keys");
-    sweep.check = [this](const SweptRun& run) { EXPECT_FALSE(contains(run.end.told, aKey)) << run.end.told; };
+    sweep.check = [](const SweptRun& run) { EXPECT_FALSE(contains(run.end.told, aKey)) << run.end.told; };
     EXPECT_GE(sweepFaults(sweep), 20);
     EXPECT_EQ(tellAllKeys(), own_);
 }
