@@ -15,7 +15,6 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr auto none = Access::none;
-constexpr auto read = Access::read;
 constexpr auto write = Access::write;
 
 const fs::path home = "/mnt/home/alice";
